@@ -1,0 +1,93 @@
+# The library is built from components, each an object library that links only what lies on its own floor or below.
+# The shared library is linked from all of them; a unit test links the objects of its component and of everything
+# below it, so that private helpers can be tested.
+
+add_library(quo_flags INTERFACE)
+target_compile_options(quo_flags INTERFACE
+    -Wall -Wextra -Wpedantic -Wconversion -Wshadow -Wformat=2
+    -fno-semantic-interposition
+    # Results must not hang on which operations the compiler chose to fuse.
+    -ffp-contract=off)
+target_compile_definitions(quo_flags INTERFACE _FILE_OFFSET_BITS=64)
+if(QUO_SANITIZE)
+    # Frame pointers and line tables are enough for readable findings and keep the build small.
+    set(quo_sanitize -fsanitize=address,undefined -fno-sanitize-recover=all -fno-omit-frame-pointer)
+    target_compile_options(quo_flags INTERFACE ${quo_sanitize} -O1 -g1)
+    target_link_options(quo_flags INTERFACE ${quo_sanitize})
+endif()
+
+# quo_component(name SOURCES ... [DEPENDS component ...] [LINK library ...])
+function(quo_component name)
+    cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "SOURCES;DEPENDS;LINK")
+    set(target quo_${name})
+    add_library(${target} OBJECT ${arg_SOURCES})
+    target_compile_definitions(${target} PRIVATE QUO_BASE_BUILD)
+    target_include_directories(${target} PUBLIC
+        "${PROJECT_SOURCE_DIR}/include" "${PROJECT_SOURCE_DIR}/libsrc/sources" "${PROJECT_SOURCE_DIR}/libsrc/cppsources")
+    target_link_libraries(${target} PRIVATE quo_flags ${arg_LINK})
+    set_target_properties(${target} PROPERTIES QUO_DEPENDS "${arg_DEPENDS}" QUO_LINK "${arg_LINK}")
+    set_property(GLOBAL APPEND PROPERTY QUO_COMPONENTS ${name})
+endfunction()
+
+# Sets `out` to the named components and everything they stand on.
+function(quo_closure out)
+    set(open ${ARGN})
+    set(closed "")
+    while(open)
+        list(POP_FRONT open name)
+        if(NOT name IN_LIST closed)
+            list(APPEND closed ${name})
+            get_target_property(below quo_${name} QUO_DEPENDS)
+            list(APPEND open ${below})
+        endif()
+    endwhile()
+    set(${out} ${closed} PARENT_SCOPE)
+endfunction()
+
+function(quo_link_components target)
+    quo_closure(names ${ARGN})
+    foreach(name IN LISTS names)
+        get_target_property(libraries quo_${name} QUO_LINK)
+        target_link_libraries(${target} PRIVATE quo_${name} ${libraries})
+    endforeach()
+    target_link_libraries(${target} PRIVATE quo_flags)
+endfunction()
+
+# quo_test(name SOURCES ... COMPONENTS component ... [LINK library ...]): one test program; ctest runs every case in a
+# process of its own, because the report, the frames and the profile cache are process-wide.
+function(quo_test name)
+    cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "SOURCES;COMPONENTS;LINK")
+    set(target ${name}_test)
+    add_executable(${target} ${arg_SOURCES})
+    target_include_directories(${target} PRIVATE "${PROJECT_SOURCE_DIR}/tests")
+    target_compile_definitions(${target} PRIVATE QUO_TEST_DATA="${PROJECT_SOURCE_DIR}/tests/data")
+    quo_link_components(${target} ${arg_COMPONENTS})
+    target_link_libraries(${target} PRIVATE ${arg_LINK} GTest::gmock GTest::gtest_main)
+    gtest_discover_tests(${target} TEST_PREFIX "${name}." DISCOVERY_TIMEOUT 120 PROPERTIES TIMEOUT 300)
+endfunction()
+
+# quo_bench(name SOURCES ... COMPONENTS component ... [LINK library ...]): one benchmark program.
+function(quo_bench name)
+    cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "SOURCES;COMPONENTS;LINK")
+    set(target ${name}_bench)
+    add_executable(${target} ${arg_SOURCES})
+    target_include_directories(${target} PRIVATE "${PROJECT_SOURCE_DIR}/bench" "${PROJECT_SOURCE_DIR}/tests")
+    target_compile_definitions(${target} PRIVATE QUO_TEST_DATA="${PROJECT_SOURCE_DIR}/tests/data")
+    quo_link_components(${target} ${arg_COMPONENTS})
+    target_link_libraries(${target} PRIVATE ${arg_LINK} benchmark::benchmark)
+endfunction()
+
+# quo_fuzz(name SOURCES ... COMPONENTS component ...): one libFuzzer target, seeded from fuzz/corpus/<name>.
+function(quo_fuzz name)
+    cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "SOURCES;COMPONENTS")
+    set(target ${name}_fuzz)
+    add_executable(${target} ${arg_SOURCES})
+    quo_link_components(${target} ${arg_COMPONENTS})
+    target_link_options(${target} PRIVATE -fsanitize=fuzzer)
+endfunction()
+
+function(quo_add_existing folder)
+    if(EXISTS "${CMAKE_CURRENT_SOURCE_DIR}/${folder}/CMakeLists.txt")
+        add_subdirectory(${folder})
+    endif()
+endfunction()

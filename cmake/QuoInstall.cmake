@@ -1,0 +1,21 @@
+# The installed package: library, headers, CMake package and pkg-config file.
+include(CMakePackageConfigHelpers)
+
+install(TARGETS quo_base EXPORT quo_base_targets
+        LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
+install(DIRECTORY "${PROJECT_SOURCE_DIR}/include/quo_base" DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+# The headers of the trio_* family, which the library exports.
+install(FILES "${TRIO_INCLUDE_DIR}/trio.h" "${TRIO_INCLUDE_DIR}/triop.h" "${TRIO_INCLUDE_DIR}/triodef.h"
+              "${TRIO_INCLUDE_DIR}/triostr.h" "${TRIO_INCLUDE_DIR}/trionan.h"
+        DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/quo_base/trio)
+
+set(config_dir ${CMAKE_INSTALL_LIBDIR}/cmake/quo_base)
+install(EXPORT quo_base_targets FILE quo_base-targets.cmake NAMESPACE quo_base:: DESTINATION ${config_dir})
+configure_package_config_file("${PROJECT_SOURCE_DIR}/cmake/quo_base-config.cmake.in"
+    "${PROJECT_BINARY_DIR}/quo_base-config.cmake" INSTALL_DESTINATION ${config_dir})
+write_basic_package_version_file("${PROJECT_BINARY_DIR}/quo_base-config-version.cmake" COMPATIBILITY SameMinorVersion)
+install(FILES "${PROJECT_BINARY_DIR}/quo_base-config.cmake" "${PROJECT_BINARY_DIR}/quo_base-config-version.cmake"
+        DESTINATION ${config_dir})
+
+configure_file("${PROJECT_SOURCE_DIR}/cmake/quo_base.pc.in" "${PROJECT_BINARY_DIR}/quo_base.pc" @ONLY)
+install(FILES "${PROJECT_BINARY_DIR}/quo_base.pc" DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)

@@ -1,0 +1,7 @@
+#!/bin/sh
+# Installs what is missing, builds the release and runs the main job on the bundled real scenes.
+set -eu
+cd "$(dirname "$0")"
+scripts/install_deps.sh
+scripts/build.sh release quo_base quo
+exec scripts/demo_job.sh build/release

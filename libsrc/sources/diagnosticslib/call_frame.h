@@ -1,0 +1,105 @@
+#ifndef QUO_CALL_FRAME_H
+#define QUO_CALL_FRAME_H
+
+#include <cerrno>
+#include <cstddef>
+#include <limits>
+
+#include "quo_base/ckerr.h"
+
+namespace quo {
+
+/** The ceremony of a tracked function: errno is reported and cleared and the name pushed on entry; leaving without
+ * success() frees every block that the call and its callees still hold; the name is popped in any case. Nothing is
+ * formatted, allocated or written while all goes well. The frame is the function's first local. */
+class CallFrame {
+public:
+    /** `function` and `source` are literals: they are kept by address and shown in the report as they stand. */
+    CallFrame(const char* function, const char* source, int line = __builtin_LINE()) noexcept
+        : function_{function}, source_{source} {
+        check_errno(line);
+        set_ckerr_fun(function_);
+    }
+    ~CallFrame() {
+        if (!succeeded_) freeall_ckerr();
+        deccurdep();
+    }
+    CallFrame(CallFrame&&) = delete;
+
+    /** Reports what a system call left in errno, and clears it. */
+    void check_errno(int line = __builtin_LINE()) noexcept {
+        report_errno(line);
+        errno = 0;
+    }
+    /** Clears what a foreign library left in errno: it would show up as an ERROR of the next function. */
+    static void drop_errno() noexcept { errno = 0; }
+
+    [[nodiscard]] int success(int line = __builtin_LINE()) noexcept {
+        report_errno(line);
+        succeeded_ = true;
+        return QUO_OK;
+    }
+    [[nodiscard]] int fail(int status, const char* message, int line = __builtin_LINE()) noexcept {
+        return leave(status, message, QUO_ERROR, line);
+    }
+    [[nodiscard]] int callee(int status, int line = __builtin_LINE()) noexcept {
+        return leave(status, "Called function returned ERROR", QUO_ERROR_CALL_TREE, line);
+    }
+    /** A failure that the contract keeps out of the report. */
+    [[nodiscard]] int silent(int status) noexcept {
+        drop_errno();
+        return status;
+    }
+
+private:
+    int leave(int status, const char* message, int kind, int line) noexcept {
+        quo_add_report(message, kind, line, function_, source_);
+        report_errno(line);
+        errno = 0;
+        return status;
+    }
+    void report_errno(int line) noexcept {
+        if (errno != 0) quo_check(errno, line, function_, source_);
+    }
+
+    const char *function_, *source_;
+    bool succeeded_ = false;
+};
+
+/** A zero-filled array from the tracked allocator, released when it goes. Empty when memory could not be had or the
+ * size overflows. */
+template <typename T>
+class TrackedBuffer {
+public:
+    TrackedBuffer() noexcept = default;
+    explicit TrackedBuffer(std::size_t count) noexcept
+        : data_{count <= std::numeric_limits<std::size_t>::max() / sizeof(T)
+                    ? static_cast<T*>(calloc_ckerr(count, sizeof(T)))
+                    : nullptr},
+          size_{data_ ? count : 0} {}
+    ~TrackedBuffer() {
+        if (data_) free_ckerr(data_);
+    }
+    TrackedBuffer(TrackedBuffer&& other) noexcept : data_{other.data_}, size_{other.size_} {
+        other.data_ = nullptr;
+        other.size_ = 0;
+    }
+    TrackedBuffer& operator=(TrackedBuffer&&) = delete;
+
+    explicit operator bool() const noexcept { return data_ != nullptr; }
+    [[nodiscard]] T* data() noexcept { return data_; }
+    [[nodiscard]] const T* data() const noexcept { return data_; }
+    [[nodiscard]] std::size_t size() const noexcept { return size_; }
+    T& operator[](std::size_t i) noexcept { return data_[i]; }
+    const T& operator[](std::size_t i) const noexcept { return data_[i]; }
+    T* begin() noexcept { return data_; }
+    T* end() noexcept { return data_ + size_; }
+
+private:
+    T* data_ = nullptr;
+    std::size_t size_ = 0;
+};
+
+}  // namespace quo
+
+#endif
