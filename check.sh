@@ -1,19 +1,16 @@
 #!/bin/sh
-# Installs what is missing, builds, and runs every check: formatting and static analysis, the tests under the
-# sanitizers, and the tests of the release. The slowest come last, and ctest's own lines close the run.
+# Installs what is missing, builds, and runs all tests: in the release, under the sanitizers, and the checks of
+# format and style. A second call builds and analyses only what has changed.
 set -eu
 cd "$(dirname "$0")"
 scripts/install_deps.sh
 
-scripts/check_format.sh
-scripts/build.sh release
-scripts/check_tidy.sh
-scripts/build.sh asan
-
-jobs=$(nproc)
-run_tests() {
-    echo "Testing the $1 preset"
-    ctest --preset "$1" --parallel "$jobs" --progress
+run() {
+    echo "Testing: $*"
+    ctest --output-on-failure --no-tests=error --parallel "$(nproc)" "$@"
 }
-run_tests asan
-run_tests release
+scripts/build.sh release
+run --test-dir build/release --label-exclude lint
+scripts/build.sh asan
+run --test-dir build/asan --label-exclude lint
+run --test-dir build/release --label-regex lint

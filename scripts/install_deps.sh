@@ -3,7 +3,7 @@
 # Usage: scripts/install_deps.sh
 set -eu
 
-packages="git ca-certificates g++ cmake ninja-build pkg-config libxml2-dev libtrio-dev libcli11-dev
+packages="git pkg-config ca-certificates g++ cmake ninja-build libxml2-dev libtrio-dev libcli11-dev
 nlohmann-json3-dev libgtest-dev libgmock-dev libbenchmark-dev clang-format clang-tidy"
 
 missing=""
