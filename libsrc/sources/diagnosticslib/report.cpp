@@ -1,0 +1,205 @@
+#include "diagnosticslib/report.h"
+
+#include <cerrno>
+#include <climits>
+#include <cstdio>
+#include <cstring>
+#include <ctime>
+#include <optional>
+
+#include "quo_base/ckerr.h"
+#include "sarutillib/bounded_text.h"
+
+namespace {
+
+constexpr char kRule[] = "==============================================================================";
+static_assert(sizeof kRule == 78 + 1);
+constexpr std::size_t kTitleRoom = 4096;
+
+/** The report or the log. */
+struct Channel {
+    std::FILE* stream;
+    int level;
+    int entries;
+
+    [[nodiscard]] bool is_open() const noexcept { return level >= 1 && level <= 3; }
+};
+
+Channel report, log_file;
+
+// Deliberate: report and log share the title and the start time. Opening the log after the report moves the origin
+// of the report's elapsed times and replaces the title of its closing banner.
+char shared_title[kTitleRoom];
+std::time_t shared_start;
+
+/** Writing diagnostics must not change what the caller finds in errno. */
+class ErrnoKept {
+public:
+    ErrnoKept() noexcept = default;
+    ~ErrnoKept() { errno = kept_; }
+    ErrnoKept(const ErrnoKept&) = delete;
+    ErrnoKept& operator=(const ErrnoKept&) = delete;
+
+private:
+    int kept_ = errno;
+};
+
+const char* shown(const char* text) noexcept {
+    return text ? text : "(null)";
+}
+
+/** The answer to a request that names no valid level. Callers only test it for zero. */
+int one_below(int level) noexcept {
+    return level == INT_MIN ? level : level - 1;
+}
+
+/** EOF when the file is not open or anything written to it was lost. */
+int close_channel(Channel& channel) noexcept {
+    if (!channel.stream) return EOF;
+    const bool lost = std::fflush(channel.stream) != 0 || std::ferror(channel.stream) != 0;
+    const bool unclosed = std::fclose(channel.stream) != 0;
+    channel.stream = nullptr;
+    return lost || unclosed ? EOF : 0;
+}
+
+/** An empty file, or null. Opening it for appending first leaves an existing file whole when it is not writable.
+ */
+std::FILE* create(const char* file_name) noexcept {
+    if (!file_name) return nullptr;
+    std::FILE* probe = std::fopen(file_name, "ae");
+    if (!probe) return nullptr;
+    std::fclose(probe);
+    return std::fopen(file_name, "we");
+}
+
+/** Opens report or log. Returns the answer for a request that opens nothing, or nothing once the file is open. */
+std::optional<int> open_channel(Channel& channel, const char* file_name, const char* title, int level) noexcept {
+    if (channel.is_open() || !ckflg_ckerr()) return channel.level;
+    channel.level = 0;
+    if (level < 1 || level > 3) return one_below(level);
+
+    std::FILE* stream = create(file_name);
+    if (!stream) return 0;
+    // A file may still be open behind a level that was forced to 0; all of it is on the disk already.
+    if (channel.stream) close_channel(channel);
+    channel = {stream, level, 0};
+    std::time(&shared_start);
+    quo::copy_bounded(shared_title, shown(title));
+    return std::nullopt;
+}
+
+/** Date and time in the 24-character calendar form and a line feed. */
+struct DateText {
+    char text[32];
+    explicit DateText(std::time_t at) noexcept {
+        if (!ctime_r(&at, text)) quo::copy_bounded(text, "\n");
+    }
+};
+
+const char* name_of(int kind) noexcept {
+    switch (kind) {
+        case QUO_ERROR:
+            return "ERROR";
+        case QUO_WARNING:
+            return "WARNING";
+        case QUO_CHECKPOINT:
+            return "CHECKPOINT";
+        case QUO_ERROR_CALL_TREE:
+            return "ERROR_CALL_TREE";
+        case QUO_CORRECT_FUNCTION_CALL:
+            return "CORRECT_FUNCTION_CALL";
+        case QUO_CORRECT_SYSTEM_CALL:
+            return "CORRECT_SYSTEM_CALL";
+        case QUO_MESSAGE:
+            return "MESSAGE";
+        case QUO_EXCEPTION:
+            return "EXCEPTION";
+        default:
+            return "UNKNOWN";
+    }
+}
+
+struct Entry {
+    const char* message;
+    int kind, line;
+    const char *function, *file;
+};
+
+void write_entry(std::FILE* stream, int number, const Entry& entry) noexcept {
+    const int elapsed_s = static_cast<int>(std::difftime(std::time(nullptr), shared_start));
+    if (entry.kind == QUO_ERROR) {
+        std::fprintf(
+            stream, "\n%d)  %s [%d sec].\n    FILE : %s.\n    FUNCTION : %s.\n    LINE : %d.\n    MESSAGE : %s.\n",
+            number, name_of(entry.kind), elapsed_s, entry.file, entry.function, entry.line, entry.message);
+    } else if (entry.kind == QUO_ERROR_CALL_TREE) {
+        std::fprintf(stream, "    . Call tree: FILE %s, FUNCTION %s, LINE %d.\n", entry.file, entry.function,
+                     entry.line);
+    } else {
+        std::fprintf(stream, "\n%d)  %s [%d sec]: %s\n    . FILE %s, FUNCTION %s, LINE %d.\n", number,
+                     name_of(entry.kind), elapsed_s, entry.message, entry.file, entry.function, entry.line);
+    }
+    std::fflush(stream);
+}
+
+}  // namespace
+
+void quo::silence_report_and_log() noexcept {
+    report.level = log_file.level = 0;
+}
+
+extern "C" int init_report(const char* file_name, const char* title, int level) noexcept {
+    if (const auto answer = open_channel(report, file_name, title, level)) return *answer;
+    const ErrnoKept kept;
+    std::fprintf(report.stream, "\n%s\n QUOREL report (level %d) - %s - Started on %s%s\n", kRule, level,
+                 shared_title, DateText{shared_start}.text, kRule);
+    return std::fflush(report.stream);
+}
+
+extern "C" int init_log(const char* file_name, const char* title, int level) noexcept {
+    return open_channel(log_file, file_name, title, level).value_or(1);
+}
+
+extern "C" int exit_report(void) noexcept {
+    if (!report.is_open()) return one_below(report.level);
+    quo::silence_report_and_log();
+    if (report.stream)
+        std::fprintf(report.stream, "\n%s\n QUOREL report - %s - Ended on %s%s\n", kRule, shared_title,
+                     DateText{std::time(nullptr)}.text, kRule);
+    const int report_closed = close_channel(report);
+    const int log_closed = log_file.stream ? close_channel(log_file) : 0;
+    return report_closed != 0 ? report_closed : log_closed;
+}
+
+extern "C" int ckflg_report(void) noexcept {
+    return report.level;
+}
+
+extern "C" int set_flg_report(int level) noexcept {
+    return report.level = level;
+}
+
+extern "C" void quo_add_report(const char* message, int kind, int line, const char* function,
+                               const char* file) noexcept {
+    if (!report.is_open()) return;
+    const ErrnoKept kept;
+    const Entry entry{shown(message), kind, line, shown(function), shown(file)};
+    if (report.stream) write_entry(report.stream, report.entries, entry);  // none behind a level that was forced
+    if (kind == QUO_ERROR || kind == QUO_MESSAGE) {
+        std::fprintf(stderr, "MSG_%s: %s.\n", name_of(kind), entry.message);
+        std::fflush(stderr);
+    }
+    ++report.entries;
+}
+
+extern "C" int quo_add_log(const char* text) noexcept {
+    if (!log_file.stream) return EOF;
+    const ErrnoKept kept;
+    std::fprintf(log_file.stream, "\n%d) %s\n", log_file.entries++, shown(text));
+    return std::fflush(log_file.stream);
+}
+
+extern "C" void quo_check(int error_number, int line, const char* function, const char* file) noexcept {
+    if (error_number == 0 || !report.is_open()) return;
+    const ErrnoKept kept;
+    quo_add_report(std::strerror(error_number), QUO_ERROR, line, function, file);
+}
