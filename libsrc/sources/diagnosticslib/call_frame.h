@@ -3,39 +3,41 @@
 
 #include <cerrno>
 #include <cstddef>
-#include <limits>
+#include <type_traits>
+#include <utility>
 
+#include "diagnosticslib/call_stack.h"
 #include "quo_base/ckerr.h"
 
 namespace quo {
 
 /** The ceremony of a tracked function: errno is reported and cleared and the name pushed on entry; leaving without
  * success() frees every block that the call and its callees still hold; the name is popped in any case. Nothing is
- * formatted, allocated or written while all goes well. The frame is the function's first local. */
+ * copied, formatted, allocated or written while all goes well. The frame is the function's first local. */
 class CallFrame {
 public:
     /** `function` and `source` are literals: they are kept by address and shown in the report as they stand. */
     CallFrame(const char* function, const char* source, int line = __builtin_LINE()) noexcept
         : function_{function}, source_{source} {
         check_errno(line);
-        set_ckerr_fun(function_);
+        call_stack.push(function);
     }
     ~CallFrame() {
         if (!succeeded_) freeall_ckerr();
-        deccurdep();
+        call_stack.pop();
     }
     CallFrame(CallFrame&&) = delete;
 
     /** Reports what a system call left in errno, and clears it. */
     void check_errno(int line = __builtin_LINE()) noexcept {
-        report_errno(line);
-        errno = 0;
+        if (errno != 0) [[unlikely]]
+            report_errno(line);
     }
     /** Clears what a foreign library left in errno: it would show up as an ERROR of the next function. */
     static void drop_errno() noexcept { errno = 0; }
 
     [[nodiscard]] int success(int line = __builtin_LINE()) noexcept {
-        report_errno(line);
+        check_errno(line);
         succeeded_ = true;
         return QUO_OK;
     }
@@ -52,38 +54,39 @@ public:
     }
 
 private:
-    int leave(int status, const char* message, int kind, int line) noexcept {
+    [[gnu::cold]] int leave(int status, const char* message, int kind, int line) noexcept {
         quo_add_report(message, kind, line, function_, source_);
-        report_errno(line);
-        errno = 0;
+        check_errno(line);
         return status;
     }
-    void report_errno(int line) noexcept {
-        if (errno != 0) quo_check(errno, line, function_, source_);
+    /** Clears errno as well: the caller's frame would report the same number again. */
+    [[gnu::cold]] void report_errno(int line) noexcept {
+        quo_check(errno, line, function_, source_);
+        errno = 0;
     }
 
     const char *function_, *source_;
     bool succeeded_ = false;
 };
 
-/** A zero-filled array from the tracked allocator, released when it goes. Empty when memory could not be had or the
- * size overflows. */
+/** A zero-filled array from the tracked allocator, released when it goes. Empty when memory could not be had or
+ * the size overflows. */
 template <typename T>
 class TrackedBuffer {
+    static_assert(std::is_trivially_copyable_v<T> && alignof(T) <= 16, "the elements begin and end as mere bytes");
+
 public:
     TrackedBuffer() noexcept = default;
     explicit TrackedBuffer(std::size_t count) noexcept
-        : data_{count <= std::numeric_limits<std::size_t>::max() / sizeof(T)
-                    ? static_cast<T*>(calloc_ckerr(count, sizeof(T)))
-                    : nullptr},
-          size_{data_ ? count : 0} {}
+        : data_{static_cast<T*>(calloc_ckerr(count, sizeof(T)))}, size_{data_ ? count : 0} {
+        if (!data_)
+            free_ckerr(nullptr);  // the null entry that a failed allocation leaves among the tracked blocks
+    }
     ~TrackedBuffer() {
         if (data_) free_ckerr(data_);
     }
-    TrackedBuffer(TrackedBuffer&& other) noexcept : data_{other.data_}, size_{other.size_} {
-        other.data_ = nullptr;
-        other.size_ = 0;
-    }
+    TrackedBuffer(TrackedBuffer&& other) noexcept
+        : data_{std::exchange(other.data_, nullptr)}, size_{std::exchange(other.size_, 0)} {}
     TrackedBuffer& operator=(TrackedBuffer&&) = delete;
 
     explicit operator bool() const noexcept { return data_ != nullptr; }
