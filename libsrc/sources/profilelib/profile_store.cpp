@@ -1,0 +1,142 @@
+#include "profilelib/profile_store.h"
+
+#include <cerrno>
+#include <cstdint>
+#include <cstdio>
+
+#include "profilelib/out_of_memory.h"
+#include "quo_base/profile.h"
+#include "sarutillib/file_io.h"
+
+namespace quo {
+namespace {
+
+/** Longest regular file that is read. */
+constexpr std::int64_t kLongestFile = std::int64_t{1} << 30;
+/** Longest text taken from a pipe or device, some of which never end. */
+constexpr std::int64_t kLongestStream = std::int64_t{64} << 20;
+
+}  // namespace
+
+ProfileStore& ProfileStore::instance() {
+    // Never destroyed: objects of the host that are destroyed at exit may still read and sync their parameters.
+    static ProfileStore& store = *new ProfileStore;
+    return store;
+}
+
+ProfileContent& ProfileStore::load(std::string_view path) {
+    if (File* const known = find(path)) return known->content;
+    File& file = files_.emplace_back();
+    file.path = path;
+    by_path_.emplace(file.path, std::prev(files_.end()));
+    read(file);
+    current_ = &file;
+    return file.content;
+}
+
+ProfileContent* ProfileStore::loaded(std::string_view path) {
+    File* const file = find(path);
+    return file ? &file->content : nullptr;
+}
+
+int ProfileStore::sync(std::string_view path) {
+    const File* const file = find(path);
+    return file ? write(*file) : 0;
+}
+
+int ProfileStore::sync_all() {
+    int status = 0;
+    for (const File& file : files_) status = write(file);
+    // Deliberate: callers know the result of the file loaded last, inverted.
+    return status == 0 ? -1 : 0;
+}
+
+void ProfileStore::free(std::string_view path) {
+    const auto entry = by_path_.find(path);
+    if (entry == by_path_.end()) return;
+    const auto file = entry->second;
+    if (current_ == &*file) current_ = nullptr;
+    by_path_.erase(entry);
+    files_.erase(file);
+}
+
+void ProfileStore::free_all() {
+    current_ = nullptr;
+    by_path_.clear();
+    files_.clear();
+}
+
+ProfileStore::File* ProfileStore::find(std::string_view path) {
+    if (current_ && current_->path == path) return current_;
+    const auto entry = by_path_.find(path);
+    if (entry == by_path_.end()) return nullptr;
+    return current_ = &*entry->second;
+}
+
+void ProfileStore::read(File& file) {
+    const char* const path = file.path.c_str();
+    const auto text = read_file(path, file_length(path) ? kLongestFile : kLongestStream);
+    if (text) file.content.parse(*text);
+    if (!text && errno == ENOMEM) end_process(kNoMoreMemory);
+    file.unread = !text && (errno == EFBIG || errno == EIO);
+    errno = 0;
+}
+
+int ProfileStore::write(const File& file) {
+    if (file.unread) return 1;
+    const std::string text = file.content.text();
+    AtomicFile target{file.path.c_str()};
+    if (!target.good() && errno == ENOMEM) end_process(kNoMemory);
+    const int status = !target.good() ? 1 : target.write(text) && target.commit() ? 0 : -1;
+    errno = 0;
+    return status;
+}
+
+}  // namespace quo
+
+using quo::ProfileContent;
+using quo::ProfileStore;
+
+extern "C" const char* GetSetProfileChar(int write, const char* section, const char* key, const char* value,
+                                         const char* file) noexcept {
+    if (!section || !key || !file || (write && !value)) return nullptr;
+    return quo::or_end_process(quo::kNoMemory, [&] {
+        ProfileContent& content = ProfileStore::instance().load(file);
+        return write ? content.set(section, key, value) : content.find(section, key);
+    });
+}
+
+extern "C" int SyncProfile(const char* file) noexcept {
+    return quo::or_end_process(quo::kNoMemory, [&] {
+        return file ? ProfileStore::instance().sync(file) : ProfileStore::instance().sync_all();
+    });
+}
+
+extern "C" void FreeProfile(const char* file) noexcept {
+    quo::or_end_process(quo::kNoMemory, [&] {
+        if (file)
+            ProfileStore::instance().free(file);
+        else
+            ProfileStore::instance().free_all();
+    });
+}
+
+extern "C" void DelProfileKey(const char* section, const char* key, const char* file) noexcept {
+    quo::or_end_process(quo::kNoMemory, [&] {
+        ProfileContent* const content = file ? ProfileStore::instance().loaded(file) : nullptr;
+        if (!content)
+            std::fputs("Warning: DelProfileKey called before init\n", stderr);
+        else if (section && key)
+            content->erase_key(section, key);
+    });
+}
+
+extern "C" void DelProfileSection(const char* section, const char* file) noexcept {
+    quo::or_end_process(quo::kNoMemory, [&] {
+        ProfileContent* const content = file ? ProfileStore::instance().loaded(file) : nullptr;
+        if (!content)
+            std::fputs("Warning: DelProfileSection called before init\n", stderr);
+        else if (section)
+            content->erase_section(section);
+    });
+}
