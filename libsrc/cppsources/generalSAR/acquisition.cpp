@@ -1,0 +1,262 @@
+#include "quo_base/acquisition.h"
+
+#include <algorithm>
+#include <cmath>
+#include <limits>
+#include <numbers>
+#include <optional>
+#include <string>
+
+#include "diagnosticslib/call_frame.h"
+#include "quo_base/profile.h"
+#include "quorelxmllib/field_table.h"
+#include "roilib/rounding.h"
+#include "sarutillib/bounded_text.h"
+
+namespace {
+
+constexpr const char* kSource = "generalSAR";
+constexpr double kMaxInt = std::numeric_limits<std::int32_t>::max();
+
+namespace sampling {
+using Obj = SamplingConstants_Obj;
+constexpr quo::FieldTable kTable{
+    "SamplingConstants",
+    QUO_FIELD(fc_hz, "CarrierFrequency"),
+    QUO_FIELD(frg_hz, "SamplingRate"),
+    QUO_FIELD(Brg_hz, "RangeBandWidth"),
+    QUO_FIELD(Trg_s, "RangeTSamplingStep"),
+    QUO_FIELD(prf_hz, "PRF"),
+    QUO_FIELD(pri_s, "PRI"),
+    QUO_FIELD(Baz_hz, "AzimuthBandwidth"),
+    QUO_FIELD(brf_hz, "BRF"),
+    QUO_FIELD(bri_s, "BRI"),
+    QUO_FIELD(lambda_m, "WaveLength"),
+};
+}  // namespace sampling
+
+namespace pulse {
+using Obj = SARPulse_Obj;
+constexpr quo::FieldTable kTable{
+    "Pulse",
+    QUO_FIELD(PulseLength),
+    QUO_FIELD(Bandwidth),
+    QUO_FIELD(PulseKRate),
+    QUO_FIELD(PulseEnergy),
+    QUO_FIELD(PulseSamplingRate),
+};
+}  // namespace pulse
+
+namespace attitude {
+using Obj = SensorAttitude_Obj;
+constexpr quo::FieldTable kTable{
+    "SensorAttitude",       QUO_FIELD(Eq_speed),      QUO_FIELD(Eq_distance), QUO_FIELD(Mean_DC),
+    QUO_FIELD(SquintAngle), QUO_FIELD(AntennaLength), QUO_FIELD(DroopGain),   QUO_FIELD(Temperature),
+};
+}  // namespace attitude
+
+namespace windows {
+using Obj = SpectralWindows_Obj;
+constexpr quo::FieldTable kTable{
+    "SpectralWindows",
+    QUO_FIELD(AzMatchedFilterType),
+    QUO_FIELD(RgMatchedFilterType),
+    QUO_FIELD(RgMatchedFilterCoef),
+    QUO_FIELD(AzMatchedFilterCoef),
+    QUO_FIELD(RgLookBandwidth),
+    QUO_FIELD(AzLookBandwidth),
+};
+}  // namespace windows
+
+namespace quicklook {
+using Obj = QuickLook_Obj;
+constexpr quo::FieldTable kTable{
+    "QuickLook",
+    QUO_FIELD(QL_FirstSample, quo::bounds(0, kMaxInt)),
+    QUO_FIELD(QL_Samples, quo::bounds(0, kMaxInt)),
+    QUO_FIELD(QL_FirstLine, quo::bounds(0, kMaxInt)),
+    QUO_FIELD(QL_Lines, quo::bounds(0, kMaxInt)),
+    QUO_FIELD(QL_AzimuthML, quo::bounds(0, kMaxInt)),
+    QUO_FIELD(QL_RangeML, quo::bounds(0, kMaxInt)),
+};
+}  // namespace quicklook
+
+namespace point {
+using Obj = geopoint;
+constexpr quo::FieldTable kTable{"GroundCornersPoints", QUO_FIELD(Point)};
+constexpr const char* kProfileSection = "Coordinates";
+
+std::string section_of(const char* name) {
+    return std::string{kTable.section()} + "/" + std::string{quo::text_or_empty(name)};
+}
+}  // namespace point
+
+/** The numbers that a reference chirp follows from. */
+struct Chirp {
+    int samples;
+    double half_length;    // from the middle to the first sample, in samples
+    double sampling_rate;  // Hz
+    double phase_rate;     // rad/s^2
+    double divisor;        // of the amplitude
+    [[nodiscard]] double phase(int n) const {
+        const double t = (n - half_length) / sampling_rate;
+        return phase_rate * (t * t);
+    }
+};
+
+/** Nothing where the pulse does not make a chirp that a caller can store. */
+std::optional<Chirp> chirp_of(const SARPulse_Obj& pulse) {
+    if (!(pulse.PulseLength > 0.0) || !(pulse.PulseSamplingRate > 0.0)) return std::nullopt;
+    const int n = quo::round_clamped(pulse.PulseSamplingRate * pulse.PulseLength);
+    if (n < 1 || n > SARPulse_Obj::kMaxChirpSamples) return std::nullopt;
+
+    const Chirp chirp{n, (n - 1) * 0.5, pulse.PulseSamplingRate,
+                      std::numbers::pi * pulse.Bandwidth / pulse.PulseLength,
+                      std::sqrt(std::abs(n / pulse.Bandwidth * pulse.PulseSamplingRate))};
+    // The phase is largest at the ends; both tests fail for what is no number, too.
+    const bool finite = std::isfinite(chirp.phase(0)) && 1.0 / chirp.divisor <= std::numeric_limits<float>::max();
+    return finite ? std::optional{chirp} : std::nullopt;
+}
+
+fcomplex sample_of(const Chirp& chirp, int n) {
+    const double phase = chirp.phase(n);
+    return {static_cast<float>(std::cos(phase) / chirp.divisor),
+            static_cast<float>(std::sin(phase) / chirp.divisor)};
+}
+
+}  // namespace
+
+SamplingConstants_Obj::SamplingConstants_Obj() {
+    createElementsVector(sampling::kTable.size());
+}
+void SamplingConstants_Obj::refreshParameters() {
+    sampling::kTable.register_all(*this);
+}
+int SamplingConstants_Obj::clone(SamplingConstants_Obj* to) const {
+    return sampling::kTable.copy(*this, *to);
+}
+int SamplingConstants_Obj::writehdr(const char* file) {
+    return writeAuxiliaryFile(file, 1, sampling::kTable.section());
+}
+int SamplingConstants_Obj::readhdr(const char* file) {
+    return readAuxiliaryFile(file, 1, sampling::kTable.section()) ? QUO_OK
+                                                                  : sampling::kTable.read_profile(*this, file);
+}
+
+SARPulse_Obj::SARPulse_Obj() {
+    createElementsVector(pulse::kTable.size());
+}
+void SARPulse_Obj::refreshParameters() {
+    pulse::kTable.register_all(*this);
+}
+int SARPulse_Obj::clone(SARPulse_Obj* to) const {
+    return pulse::kTable.copy(*this, *to);
+}
+int SARPulse_Obj::writehdr(const char* file) {
+    return writeAuxiliaryFile(file, 1, pulse::kTable.section());
+}
+int SARPulse_Obj::readhdr(const char* file) {
+    return readAuxiliaryFile(file, 1, pulse::kTable.section()) ? QUO_OK : pulse::kTable.read_profile(*this, file);
+}
+
+int SARPulse_Obj::chirpSamples() const {
+    const auto chirp = chirp_of(*this);
+    return chirp ? chirp->samples : 0;
+}
+
+int SARPulse_Obj::generateChirp(fcomplex* samples) const {
+    quo::CallFrame frame{"SARPulse_Obj::generateChirp", kSource};
+    const auto chirp = chirp_of(*this);
+    if (!chirp || !samples) return frame.fail(QUO_REFUSED, "The pulse gives no reference chirp");
+
+    // The chirp is symmetric to the last bit: each phase serves the two samples at its distance from the middle.
+    for (int first = 0, last = chirp->samples - 1; first <= last; ++first, --last)
+        samples[first] = samples[last] = sample_of(*chirp, first);
+    return frame.success();
+}
+
+SensorAttitude_Obj::SensorAttitude_Obj() {
+    createElementsVector(attitude::kTable.size());
+}
+void SensorAttitude_Obj::refreshParameters() {
+    attitude::kTable.register_all(*this);
+}
+int SensorAttitude_Obj::clone(SensorAttitude_Obj* to) const {
+    return attitude::kTable.copy(*this, *to);
+}
+int SensorAttitude_Obj::writehdr(const char* file) {
+    return writeAuxiliaryFile(file, 1, attitude::kTable.section());
+}
+int SensorAttitude_Obj::readhdr(const char* file) {
+    return readAuxiliaryFile(file, 1, attitude::kTable.section()) ? QUO_OK
+                                                                  : attitude::kTable.read_profile(*this, file);
+}
+
+SpectralWindows_Obj::SpectralWindows_Obj() {
+    createElementsVector(windows::kTable.size());
+}
+void SpectralWindows_Obj::refreshParameters() {
+    windows::kTable.register_all(*this);
+}
+int SpectralWindows_Obj::clone(SpectralWindows_Obj* to) const {
+    return windows::kTable.copy(*this, *to);
+}
+int SpectralWindows_Obj::writehdr(const char* file) {
+    return writeAuxiliaryFile(file, 1, windows::kTable.section());
+}
+int SpectralWindows_Obj::readhdr(const char* file) {
+    return readAuxiliaryFile(file, 1, windows::kTable.section()) ? QUO_OK
+                                                                 : windows::kTable.read_profile(*this, file);
+}
+
+QuickLook_Obj::QuickLook_Obj() {
+    createElementsVector(quicklook::kTable.size());
+}
+void QuickLook_Obj::refreshParameters() {
+    quicklook::kTable.register_all(*this);
+}
+int QuickLook_Obj::clone(QuickLook_Obj* to) const {
+    to->QL_FirstSample = QL_FirstSample;
+    to->QL_FirstLine = QL_FirstLine;
+    to->QL_Samples = QL_Samples;
+    to->QL_Lines = QL_Lines;
+    return QUO_OK;  // deliberate: the multilook factors of the target stay
+}
+int QuickLook_Obj::writehdr(const char* file) {
+    return writeAuxiliaryFile(file, 1, quicklook::kTable.section());
+}
+int QuickLook_Obj::readhdr(const char* file) {
+    readAuxiliaryFile(file, 1, quicklook::kTable.section());
+    return QUO_OK;  // deliberate: a product without a quick-look is as good as one with
+}
+
+geopoint::geopoint() {
+    createElementsVector(point::kTable.size());
+}
+void geopoint::refreshParameters() {
+    point::kTable.register_all(*this);
+}
+int geopoint::clone(geopoint* to) const {
+    to->Latitude = Latitude;
+    to->Longitude = Longitude;
+    to->Height = Height;
+    to->IncidenceAngle = IncidenceAngle;
+    to->LookAngle = LookAngle;
+    return point::kTable.copy(*this, *to);
+}
+int geopoint::writehdr(const char* file, const char* name) {
+    const double values[] = {Latitude, Longitude, Height, IncidenceAngle, LookAngle};
+    std::ranges::copy(values, Point);
+    return writeAuxiliaryFile(file, 1, point::section_of(name).c_str());
+}
+int geopoint::readhdr(const char* file, const char* name) {
+    // Deliberate: what Point holds becomes the named members even where neither form of the file has the point.
+    if (!readAuxiliaryFile(file, 1, point::section_of(name).c_str()))
+        GetProfileDoubleArray(point::kProfileSection, name, Point, static_cast<int>(std::size(Point)), file);
+    Latitude = Point[0];
+    Longitude = Point[1];
+    Height = Point[2];
+    IncidenceAngle = Point[3];
+    LookAngle = Point[4];
+    return QUO_OK;
+}

@@ -1,0 +1,190 @@
+#include "quo_base/dataset_info.h"
+
+#include <algorithm>
+#include <limits>
+#include <span>
+#include <string_view>
+
+#include "quorelxmllib/field_table.h"
+#include "sarutillib/bounded_text.h"
+
+namespace {
+
+constexpr double kMaxInt = std::numeric_limits<std::int32_t>::max();
+
+using Obj = DataSetInfo_Obj;
+// The optional fields are those whose keys may also be missing in a parameter file.
+constexpr quo::FieldTable kTable{
+    "DataSetInfo",
+    QUO_FIELD(OrbitNumber),
+    QUO_FIELD(Track),
+    QUO_FIELD(SenseDate),
+    QUO_FIELD(SceneID),
+    QUO_FIELD(Description),
+    QUO_FIELD(AcquisitionStation),
+    QUO_FIELD(ProcessingCenter),
+    QUO_FIELD(ProcessingDate),
+    QUO_FIELD(ProcessingSoftware),
+    QUO_FIELD(SceneHeading),
+    QUO_FIELD(OrbitConfiguration),
+    QUO_FIELD(Polarization),
+    QUO_FIELD(Swath),
+    QUO_FIELD(SWST_MIN),
+    QUO_FIELD(SWST_MAX),
+    QUO_FIELD(RO_REF),
+    QUO_FIELD(RangeLooks, quo::bounds(1, 1000)),
+    QUO_FIELD(RangeBandwidth),
+    QUO_FIELD(ExternalCalibrationFactor),
+    QUO_FIELD(Projection),
+    QUO_FIELD(ImageType, quo::kOptional),
+    QUO_FIELD(RGAntenna_flag, quo::bounds(0, 1), quo::kOptional),
+    QUO_FIELD(AZAntenna_flag, quo::bounds(0, 1), quo::kOptional),
+    QUO_FIELD(SpreadLoss_flag, quo::bounds(0, 1), quo::kOptional),
+    QUO_FIELD(DroopGain_flag, quo::bounds(0, 1), quo::kOptional),
+    QUO_FIELD(RGAntenna_AltitudeCorr_flag, quo::bounds(0, 1), quo::kOptional),
+    QUO_FIELD(NoiseCorr_flag, quo::bounds(0, 1), quo::kOptional),
+    QUO_FIELD(SensorName, quo::kOptional),
+    QUO_FIELD(AcquisitionMode, quo::kOptional),
+    QUO_FIELD(RefSystem, quo::kOptional),
+    QUO_FIELD(UnitType, quo::kOptional),
+    QUO_FIELD(MissingLines, quo::bounds(0, kMaxInt), quo::kOptional),
+    QUO_FIELD(LookDirection, quo::bounds(0, kMaxInt), quo::kOptional, quo::kXmlOnly),
+};
+
+// The texts of the enumerations, by value; 0 is the text of what is not set.
+constexpr std::string_view kImageTypes[] = {
+    "NOT SET",
+    "RANGE FOCUSED",
+    "AZIMUTH FOCUSED",
+    "RAW DATA",
+    "MULTILOOK",
+    "INTERFEROMETRY",
+    "FLAT EARTH",
+    "COHERENCE MAP",
+    "DEM",
+    "SYNTHETIC FRINGES",
+    "DEM IMAGE TIMES MAP",
+    "IMAGE HEIGHT MAP",
+    "COREGISTERED SLANT RANGE COMPLEX IMAGE",
+    "PHASE UNWRAPPED",
+    "RAW DATA ALIGNED",
+};
+constexpr std::string_view kSensors[] = {"SENSOR UNKNOWN", "ASAR",  "RADARSAT", "ERS1",  "ERS2", "PALSAR",
+                                         "TERRA SAR-X",    "CSKS1", "CSKS2",    "CSKS3", "CSKS4"};
+constexpr std::string_view kAcqModes[] = {"ACQUISITION MODE UNDEFINED", "STRIPMAP", "DOUBLE POLARIZATION",
+                                          "QUAD POLARIZATION", "SCANSAR"};
+constexpr std::string_view kProjections[] = {"PROJECTION UNDEFINED", "GROUND RANGE", "SLANT RANGE", "GEOCODED"};
+constexpr std::string_view kUnitTypes[] = {
+    "UNIT TYPE UNDEFINED", "VOLT", "VOLT^2", "VOLTcomplex", "meter", "Radian", "Degree", "sec"};
+constexpr std::string_view kRefSystems[] = {"REFERENCE SYSTEM UNDEFINED", "WGS84", "EGM84"};
+
+using Texts = std::span<const std::string_view>;
+
+bool is_listed(Texts texts, int value) {
+    return value >= 0 && static_cast<std::size_t>(value) < texts.size();
+}
+
+template <std::size_t Room>
+int store_text(char (&member)[Room], Texts texts, int value) {
+    quo::copy_bounded(member, texts[is_listed(texts, value) ? static_cast<std::size_t>(value) : 0]);
+    return QUO_OK;
+}
+
+bool holds_text(std::string_view member, Texts texts, int value) {
+    return is_listed(texts, value) && member == texts[static_cast<std::size_t>(value)];
+}
+
+struct NumberedText {
+    std::string_view text;
+    int number;
+};
+constexpr NumberedText kPolarizations[] = {{"H/H", 0}, {"V/V", 1}, {"H/V", 2}, {"V/H", 3}};
+// Deliberate: SS1 is 7, where the order of the others would make it 1.
+constexpr NumberedText kSwaths[] = {{"SS1", 7}, {"SS2", 2}, {"SS3", 3}, {"SS4", 4}, {"SS5", 5}, {"IS1", 0},
+                                    {"IS2", 1}, {"IS3", 2}, {"IS4", 3}, {"IS5", 4}, {"IS6", 5}, {"IS7", 6}};
+
+int number_of(std::string_view text, std::span<const NumberedText> rows) {
+    const auto row = std::ranges::find(rows, text, &NumberedText::text);
+    return row == rows.end() ? DataSetInfo_Obj::kUnknownNumber : row->number;
+}
+
+}  // namespace
+
+DataSetInfo_Obj::DataSetInfo_Obj() {
+    createElementsVector(kTable.size());
+}
+void DataSetInfo_Obj::refreshParameters() {
+    kTable.register_all(*this);
+}
+int DataSetInfo_Obj::clone(DataSetInfo_Obj* to) const {
+    return kTable.copy(*this, *to);
+}
+int DataSetInfo_Obj::writehdr(const char* file) {
+    return writeAuxiliaryFile(file, 1, kTable.section());
+}
+int DataSetInfo_Obj::readhdr(const char* file) {
+    return readAuxiliaryFile(file, 1, kTable.section()) ? QUO_OK : kTable.read_profile(*this, file);
+}
+
+int DataSetInfo_Obj::SetImageType(DSImageType value) {
+    return store_text(ImageType, kImageTypes, value);
+}
+int DataSetInfo_Obj::SetSensorType(DSSensorType value) {
+    return store_text(SensorName, kSensors, value);
+}
+int DataSetInfo_Obj::SetAcqMode(DSAcqMode value) {
+    return store_text(AcquisitionMode, kAcqModes, value);
+}
+int DataSetInfo_Obj::SetProjection(DSProjection value) {
+    return store_text(Projection, kProjections, value);
+}
+int DataSetInfo_Obj::SetUnitType(DSUnitType value) {
+    return store_text(UnitType, kUnitTypes, value);
+}
+int DataSetInfo_Obj::SetRefSys(DSRefSys value) {
+    return store_text(RefSystem, kRefSystems, value);
+}
+int DataSetInfo_Obj::SetType(DSImageType image, DSSensorType sensor, DSAcqMode mode, DSProjection projection,
+                             DSUnitType unit, DSRefSys system) {
+    SetImageType(image);
+    SetSensorType(sensor);
+    SetAcqMode(mode);
+    SetProjection(projection);
+    SetUnitType(unit);
+    return IsProjection(dsGeocoded) ? SetRefSys(system) : QUO_OK;
+}
+
+bool DataSetInfo_Obj::IsImageType(DSImageType value) const {
+    return holds_text(ImageType, kImageTypes, value);
+}
+bool DataSetInfo_Obj::IsSensorType(DSSensorType value) const {
+    return holds_text(SensorName, kSensors, value);
+}
+bool DataSetInfo_Obj::IsAcqMode(DSAcqMode value) const {
+    return holds_text(AcquisitionMode, kAcqModes, value);
+}
+bool DataSetInfo_Obj::IsProjection(DSProjection value) const {
+    return holds_text(Projection, kProjections, value);
+}
+bool DataSetInfo_Obj::IsUnitType(DSUnitType value) const {
+    return holds_text(UnitType, kUnitTypes, value);
+}
+bool DataSetInfo_Obj::IsRefSys(DSRefSys value) const {
+    return holds_text(RefSystem, kRefSystems, value);
+}
+bool DataSetInfo_Obj::IsType(DSImageType image, DSSensorType sensor, DSAcqMode mode, DSProjection projection,
+                             DSUnitType unit, DSRefSys system) const {
+    return IsImageType(image) && IsSensorType(sensor) && IsAcqMode(mode) && IsProjection(projection) &&
+           IsUnitType(unit) && IsRefSys(system);
+}
+
+int DataSetInfo_Obj::fillQUOREL() {
+    quo::copy_bounded(ProcessingCenter, "QUOREL Vestra");
+    return QUO_OK;
+}
+int DataSetInfo_Obj::getPolarizationNbr() const {
+    return number_of(Polarization, kPolarizations);
+}
+int DataSetInfo_Obj::getISNbr() const {
+    return number_of(Swath, kSwaths);
+}

@@ -1,0 +1,200 @@
+#include "quo_base/roi.h"
+
+#include <algorithm>
+#include <string_view>
+
+#include "diagnosticslib/call_frame.h"
+#include "quorelxmllib/field_table.h"
+#include "roilib/rounding.h"
+#include "sarutillib/bounded_text.h"
+
+namespace {
+
+constexpr const char* kSource = "roi";
+
+namespace roi {
+using Obj = ROI_Obj;
+// Deliberate: in a parameter file only the last key decides whether the region could be read.
+constexpr quo::FieldTable kTable{
+    "ROI",
+    QUO_FIELD(SlowStartTime, quo::kProfileOptional),
+    QUO_FIELD(SlowTimeLength, quo::kProfileOptional),
+    QUO_FIELD(SlowTimeDelta, quo::kProfileOptional),
+    QUO_FIELD(FastStartTime, quo::kProfileOptional),
+    QUO_FIELD(FastTimeLength, quo::kProfileOptional),
+    QUO_FIELD(FastTimeDelta, quo::kProfileOptional),
+    QUO_FIELD(Lines, quo::kProfileOptional),
+    QUO_FIELD(Samples),
+};
+}  // namespace roi
+
+namespace coords {
+using Obj = ROI_Coords;
+constexpr quo::FieldTable kTable{
+    "ROI_Coords", QUO_FIELD(FirstSample), QUO_FIELD(FirstLine), QUO_FIELD(Samples), QUO_FIELD(Lines),
+};
+}  // namespace coords
+
+/** How many intervals a length of time holds; an axis whose interval is 0 has none. */
+double intervals(double length, double delta) {
+    return delta == 0.0 ? 0.0 : length / delta;
+}
+
+struct Axis {
+    double start, length, delta;
+    [[nodiscard]] double end() const { return start + length; }
+};
+
+/** What `a` and `b` share, counted in a's intervals; the part of an interval at the end is dropped. */
+int shared_intervals(const Axis& a, const Axis& b, double start) {
+    return quo::truncate_clamped(intervals(std::min(a.end(), b.end()) - start, a.delta));
+}
+
+}  // namespace
+
+ROI_Obj::ROI_Obj() {
+    createElementsVector(roi::kTable.size());
+}
+
+void ROI_Obj::refreshParameters() {
+    roi::kTable.register_all(*this);
+}
+
+int ROI_Obj::SetFastAxe(double start, double delta, int n) {
+    FastStartTime = start;
+    FastTimeDelta = delta;
+    Samples = n;
+    FastTimeLength = delta * n;
+    return QUO_OK;
+}
+
+int ROI_Obj::SetSlowAxe(double start, double delta, int n) {
+    SlowStartTime = start;
+    SlowTimeDelta = delta;
+    Lines = n;
+    SlowTimeLength = delta * n;
+    return QUO_OK;
+}
+
+int ROI_Obj::ResetROI() {
+    Samples = Lines = 0;
+    return QUO_OK;
+}
+
+int ROI_Obj::isNULL() const {
+    return Samples < 1 || Lines < 1 ? 1 : 0;
+}
+
+int ROI_Obj::GetFastIndex(double time) const {
+    return GetFastRange(time - FastStartTime);
+}
+
+int ROI_Obj::GetSlowIndex(double time) const {
+    return GetSlowRange(time - SlowStartTime);
+}
+
+int ROI_Obj::GetFastRange(double length) const {
+    return quo::round_clamped(intervals(length, FastTimeDelta));
+}
+
+int ROI_Obj::GetSlowRange(double length) const {
+    return quo::round_clamped(intervals(length, SlowTimeDelta));
+}
+
+ROI_Time ROI_Obj::GetUpLeft() const {
+    return {FastStartTime, SlowStartTime};
+}
+
+ROI_Time ROI_Obj::GetUpRight() const {
+    return {FastStartTime, SlowStartTime + SlowTimeLength};
+}
+
+ROI_Time ROI_Obj::GetDownLeft() const {
+    return {FastStartTime + FastTimeLength, SlowStartTime};
+}
+
+ROI_Time ROI_Obj::GetDownRight() const {
+    return {FastStartTime + FastTimeLength, SlowStartTime + SlowTimeLength};
+}
+
+ROI_Time ROI_Obj::GetCenter() const {
+    return {FastStartTime + 0.5 * FastTimeLength, SlowStartTime + 0.5 * SlowTimeLength};
+}
+
+int ROI_Obj::read_roi(const char* file, const char* name) {
+    return readAuxiliaryFile(file, 1, name) ? QUO_OK : roi::kTable.read_profile(*this, file, name);
+}
+
+int ROI_Obj::write_roi(const char* file, const char* name) {
+    writeAuxiliaryFile(file, 1, name);  // deliberate: the outcome stands in the report alone
+    return QUO_OK;
+}
+
+int ROI_Obj::IntersectROI(const ROI_Obj* a, const ROI_Obj* b, ROI_Obj* out) {
+    quo::CallFrame frame{"ROI_Obj::IntersectROI", kSource};
+    if (!a || !b || !out) return frame.fail(QUO_REFUSED, "No region given");
+
+    const Axis fast{a->FastStartTime, a->FastTimeLength, a->FastTimeDelta};
+    const Axis slow{a->SlowStartTime, a->SlowTimeLength, a->SlowTimeDelta};
+    const double fast_start = std::max(a->FastStartTime, b->FastStartTime);
+    const double slow_start = std::max(a->SlowStartTime, b->SlowStartTime);
+    const int samples =
+        shared_intervals(fast, {b->FastStartTime, b->FastTimeLength, b->FastTimeDelta}, fast_start);
+    const int lines = shared_intervals(slow, {b->SlowStartTime, b->SlowTimeLength, b->SlowTimeDelta}, slow_start);
+
+    out->SetFastAxe(fast_start, fast.delta, samples);
+    out->SetSlowAxe(slow_start, slow.delta, lines);
+    if (out->isNULL()) out->ResetROI();
+    return frame.success();
+}
+
+int ROI_Obj::clone(ROI_Obj* to) const {
+    return roi::kTable.copy(*this, *to);
+}
+
+int FileROI_Obj::SetFile(const char* file, const char* name) {
+    quo::CallFrame frame{"FileROI_Obj::SetFile", kSource};
+    const std::string_view file_text = quo::text_or_empty(file), name_text = quo::text_or_empty(name);
+    // A cut name would be that of another file.
+    if (file_text.size() >= sizeof FileName || name_text.size() >= sizeof SectionName)
+        return frame.fail(QUO_REFUSED, "File or section name too long");
+    quo::copy_bounded(FileName, file_text);
+    quo::copy_bounded(SectionName, name_text);
+    return frame.success();
+}
+
+int FileROI_Obj::read_roi() {
+    quo::CallFrame frame{"FileROI_Obj::read_roi", kSource};
+    if (FileName[0] == '\0') return frame.fail(QUO_REFUSED, "The region has no file");
+    if (const int status = read_roi(FileName, SectionName)) return frame.callee(status);
+    return frame.success();
+}
+
+ROI_Coords::ROI_Coords() {
+    createElementsVector(coords::kTable.size());
+}
+
+void ROI_Coords::refreshParameters() {
+    coords::kTable.register_all(*this);
+}
+
+int ROI_Coords::readhdr(const char* file) {
+    return readAuxiliaryFile(file, 1, coords::kTable.section()) ? QUO_OK
+                                                                : coords::kTable.read_profile(*this, file);
+}
+
+int ROI_Coords::writehdr(const char* file) {
+    return writeAuxiliaryFile(file, 1, coords::kTable.section());
+}
+
+int ROI_Coords::clone(ROI_Coords* to) const {
+    return coords::kTable.copy(*this, *to);
+}
+
+int ROI_Coords::GetROI(const ROI_Obj* image, ROI_Obj* out) const {
+    quo::CallFrame frame{"ROI_Coords::GetROI", kSource};
+    if (!image || !out) return frame.fail(QUO_REFUSED, "No region given");
+    out->SetFastAxe(image->FastStartTime + FirstSample * image->FastTimeDelta, image->FastTimeDelta, Samples);
+    out->SetSlowAxe(image->SlowStartTime + FirstLine * image->SlowTimeDelta, image->SlowTimeDelta, Lines);
+    return frame.success();
+}
