@@ -2,7 +2,10 @@
 
 #include <algorithm>
 #include <charconv>
+#include <cmath>
 #include <limits>
+
+#include "sarutillib/number_text_scale.h"
 
 namespace quo {
 namespace {
@@ -26,52 +29,90 @@ bool is_space(char c) noexcept {
 bool is_digit(char c) noexcept {
     return c >= '0' && c <= '9';
 }
+/** Letters in lower case; no other character becomes a letter. */
 char lower(char c) noexcept {
-    return c >= 'A' && c <= 'Z' ? static_cast<char>(c + ('a' - 'A')) : c;
+    return static_cast<char>(c | 0x20);
+}
+bool is_letter(char c) noexcept {
+    return lower(c) >= 'a' && lower(c) <= 'z';
 }
 bool is_hex_digit(char c) noexcept {
     return is_digit(c) || (lower(c) >= 'a' && lower(c) <= 'f');
 }
 
-/** Leading white space and sign of a number: where its digits begin, and whether a minus stood before them. */
+/** What stands before the digits of a number: where they begin, and whether a minus comes first. */
 struct Lead {
     const char* begin;
     bool negative;
 };
-Lead skip_lead(std::string_view text) noexcept {
-    const char* const end = text.data() + text.size();
-    const char* at = std::find_if_not(text.data(), end, is_space);
-    const bool negative = at != end && *at == '-';
-    if (at != end && (*at == '-' || *at == '+')) ++at;
-    return {at, negative};
+Lead skip_sign(const char* at, const char* end) noexcept {
+    if (at == end) return {at, false};
+    // Signs come as they like: a branch would be guessed wrong half the time.
+    const bool negative = *at == '-';
+    return {at + static_cast<int>(negative | (*at == '+')), negative};
+}
+Lead skip_space_and_sign(const char* at, const char* end) noexcept {
+    while (at != end && is_space(*at)) ++at;
+    return skip_sign(at, end);
 }
 
-/** Reads a run of digits, holding the value where one more digit could overflow. */
-std::int64_t saturated_digits(const char* at, const char* end) noexcept {
+/** Exponent that follows a mark at `at`, held where one more digit could overflow, and where it ends; nothing
+ * stands there when it ends at `at`. */
+struct Exponent {
+    std::int64_t value;
+    const char* end;
+};
+Exponent scan_exponent(const char* at, const char* end) noexcept {
     constexpr std::int64_t kEnough = std::numeric_limits<std::int64_t>::max() / 100;
+    const Lead lead = skip_sign(at + 1, end);
+    const char* digit = lead.begin;
     std::int64_t value = 0;
-    for (; at != end && is_digit(*at); ++at)
-        if (value < kEnough) value = 10 * value + (*at - '0');
-    return value;
+    for (; digit != end && is_digit(*digit); ++digit)
+        if (value < kEnough) value = 10 * value + (*digit - '0');
+    return {value * (1 - 2 * static_cast<int>(lead.negative)), digit == lead.begin ? at : digit};
 }
 
-/** Whether an unsigned number too large or too small for a double is too large. `begin` to `end` is a whole number
- * in digits accepted by `is_digit_of`, with its exponent, if any, after `mark` (in lower case); one place of a
- * digit weighs `exponents_per_place` steps of the exponent. */
-bool is_overflow(const char* begin, const char* end, bool (*is_digit_of)(char), char mark,
-                 std::int64_t exponents_per_place) noexcept {
-    const char* const digits_end =
-        std::find_if_not(begin, end, [=](char c) { return is_digit_of(c) || c == '.'; });
+/** An unsigned decimal number, digits * 10^exponent, and the characters it took. */
+struct Decimal {
+    std::uint64_t digits;
+    std::int64_t exponent;
+    std::size_t length;
+};
+
+/** Reads the plain cases, up to 19 digits and with no letter but the exponent's mark; for all others length is 0.
+ */
+Decimal scan_decimal(const char* begin, const char* end) noexcept {
+    constexpr std::ptrdiff_t kMostDigitsRead = std::numeric_limits<std::uint64_t>::digits10;
+    std::uint64_t digits = 0;
+    const char* at = begin;
+    for (; at != end && is_digit(*at); ++at) digits = 10 * digits + static_cast<unsigned>(*at - '0');
+    std::ptrdiff_t count = at - begin, decimals = 0;
+    if (at != end && *at == '.') {
+        const char* const point = at;
+        for (++at; at != end && is_digit(*at); ++at) digits = 10 * digits + static_cast<unsigned>(*at - '0');
+        decimals = at - point - 1;
+        count += decimals;
+    }
+    if (count == 0 || count > kMostDigitsRead) return {0, 0, 0};
+    std::int64_t exponent = -decimals;
+    if (at != end && is_letter(*at)) {
+        const auto [value, stop] = scan_exponent(at, end);
+        if (lower(*at) != 'e' || stop == at) return {0, 0, 0};
+        exponent += value;
+        at = stop;
+    }
+    return {digits, exponent, static_cast<std::size_t>(at - begin)};
+}
+
+/** Whether an unsigned number too large or too small for a double is too large. `begin` to `end` holds just that
+ * number; its exponent, if any, follows the mark (in lower case), and each place of a digit weighs
+ * `exponents_per_place` steps of it. */
+bool is_overflow(const char* begin, const char* end, char mark, std::int64_t exponents_per_place) noexcept {
+    const char* const digits_end = std::find_if(begin, end, [=](char c) { return lower(c) == mark; });
     const char* const point = std::find(begin, digits_end, '.');
     const char* const leading = std::find_if(begin, digits_end, [](char c) { return c != '0' && c != '.'; });
     const std::int64_t places = leading < point ? point - leading : point - leading + 1;
-
-    std::int64_t exponent = 0;
-    if (digits_end != end && lower(*digits_end) == mark) {
-        const Lead lead = skip_lead({digits_end + 1, end});
-        exponent = saturated_digits(lead.begin, end);
-        if (lead.negative) exponent = -exponent;
-    }
+    const std::int64_t exponent = digits_end != end ? scan_exponent(digits_end, end).value : 0;
     return places * exponents_per_place + exponent > 0;
 }
 
@@ -81,24 +122,36 @@ Scanned<double> scan_magnitude(const char* begin, const char* end, std::chars_fo
     const auto [stop, error] = std::from_chars(begin, end, value, format);
     if (error == std::errc::invalid_argument) return {0.0, 0};
     if (error == std::errc::result_out_of_range) {
-        const bool overflow = format == std::chars_format::hex ? is_overflow(begin, stop, is_hex_digit, 'p', 4)
-                                                               : is_overflow(begin, stop, is_digit, 'e', 1);
+        const bool overflow =
+            format == std::chars_format::hex ? is_overflow(begin, stop, 'p', 4) : is_overflow(begin, stop, 'e', 1);
         value = overflow ? std::numeric_limits<double>::infinity() : 0.0;
     }
     return {value, static_cast<std::size_t>(stop - begin)};
 }
 
-/** As above, with strtod's choice of base: hexadecimal after "0x", and "0" alone when no digit follows that. */
-Scanned<double> scan_any_base(const char* begin, const char* end) noexcept {
+/** Reads what follows "0x"; "0" alone is the number when no hexadecimal digit does. */
+Scanned<double> scan_hexadecimal(const char* begin, const char* end) noexcept {
+    const char* const digits_end =
+        std::find_if_not(begin, end, [](char c) { return is_hex_digit(c) || c == '.'; });
+    const bool marked = digits_end != end && lower(*digits_end) == 'p';
+    // from_chars would take two signs for one, and infinity for a digit.
+    const char* const stop = marked ? scan_exponent(digits_end, end).end : digits_end;
+    const auto [value, length] = scan_magnitude(begin, stop, std::chars_format::hex);
+    return length > 0 ? Scanned<double>{value, length + 2} : Scanned<double>{0.0, 1};
+}
+
+/** Reads an unsigned number in any of strtod's forms. Kept out of line: most numbers take the short way. */
+[[gnu::noinline]] Scanned<double> scan_any_form(const char* begin, const char* end) noexcept {
     if (begin == end || *begin == '-') return {0.0, 0};
-    if (end - begin > 2 && begin[0] == '0' && lower(begin[1]) == 'x') {
-        const auto hexadecimal = scan_magnitude(begin + 2, end, std::chars_format::hex);
-        const char first = begin[2];
-        if (hexadecimal.length > 0 && (is_hex_digit(first) || first == '.'))
-            return {hexadecimal.value, hexadecimal.length + 2};
-        return {0.0, 1};
-    }
+    if (end - begin > 2 && begin[0] == '0' && lower(begin[1]) == 'x') return scan_hexadecimal(begin + 2, end);
     return scan_magnitude(begin, end, std::chars_format::general);
+}
+
+Scanned<double> scan_unsigned(const char* begin, const char* end) noexcept {
+    const Decimal decimal = scan_decimal(begin, end);
+    if (decimal.length > 0)
+        if (const auto value = scale_by_ten(decimal.digits, decimal.exponent)) return {*value, decimal.length};
+    return scan_any_form(begin, end);
 }
 
 }  // namespace
@@ -117,16 +170,17 @@ NumberText format_int(std::int64_t value) noexcept {
 
 Scanned<double> scan_double(std::string_view text) noexcept {
     const char* const end = text.data() + text.size();
-    const Lead lead = skip_lead(text);
-    const auto [magnitude, length] = scan_any_base(lead.begin, end);
+    const Lead lead = skip_space_and_sign(text.data(), end);
+    const auto [magnitude, length] = scan_unsigned(lead.begin, end);
     if (length == 0) return {0.0, 0};
-    return {lead.negative ? -magnitude : magnitude, static_cast<std::size_t>(lead.begin - text.data()) + length};
+    return {std::copysign(magnitude, lead.negative ? -1.0 : 1.0),
+            static_cast<std::size_t>(lead.begin - text.data()) + length};
 }
 
 Scanned<std::int64_t> scan_int64(std::string_view text) noexcept {
     using Limits = std::numeric_limits<std::int64_t>;
     const char* const end = text.data() + text.size();
-    const Lead lead = skip_lead(text);
+    const Lead lead = skip_space_and_sign(text.data(), end);
     if (lead.begin == end || !is_digit(*lead.begin)) return {0, 0};
 
     std::int64_t value = 0;

@@ -17,7 +17,8 @@ struct NumberText {
     operator std::string_view() const noexcept { return {data, size}; }
 };
 
-/** The text of printf's "%.*g", whatever the locale (infinity is "inf", not-a-number "nan" or "-nan"). */
+/** The text of printf's "%.*g", whatever the locale (infinity is "inf", not-a-number "nan" or "-nan"). A negative
+ * precision stands for 6, as there; more than 32 digits are never written. */
 NumberText format_general(double value, int precision) noexcept;
 /** The shortest text that reads back to the same double. */
 NumberText format_exact(double value) noexcept;
@@ -30,8 +31,8 @@ struct Scanned {
     std::size_t length;
 };
 
-/** strtod's reading of the longest number at the start of `text`, locale-independent: leading white space and a sign
- * are taken, hexadecimal, "inf" and "nan" too; overflow gives infinity, underflow zero or a subnormal. */
+/** strtod's reading of the longest number at the start of `text`, locale-independent: leading white space and a
+ * sign are taken, hexadecimal, "inf" and "nan" too; overflow gives infinity, underflow zero or a subnormal. */
 Scanned<double> scan_double(std::string_view text) noexcept;
 /** strtoll's decimal reading; values beyond 64 bits stop at the bounds. */
 Scanned<std::int64_t> scan_int64(std::string_view text) noexcept;
