@@ -60,18 +60,17 @@ typedef struct GrPtGeometry {
     double point_m[3];    /**< ground point on the ellipsoid, Earth-fixed */
     double latitude_deg;  /**< geodetic, -90 to 90, north positive */
     double longitude_deg; /**< -180 to 180, east positive */
-    double
-        incidence_deg; /**< at the target, between the ellipsoid's outward normal and the line to the satellite */
-    double look_deg;   /**< at the satellite, between the direction to the Earth's centre and the line of sight */
-    double fm_rate_hz_s; /**< azimuth FM rate d(Doppler)/dt of the fixed target, Hz/s; negative at broadside */
-    double speed_m_s;    /**< length of the platform's velocity */
+    double incidence_deg; /**< at the target, from the ellipsoid's outward normal to the line to the satellite */
+    double look_deg;      /**< at the satellite, from the direction to the Earth's centre to the line of sight */
+    double fm_rate_hz_s;  /**< azimuth FM rate d(Doppler)/dt of the fixed target, Hz/s; negative at broadside */
+    double speed_m_s;     /**< length of the velocity that the polynomials give */
 } GrPtGeometry;
 
 /** Ground point, angles, FM rate and speed for one time, range time and Doppler on one orbit segment.
  *
  * @param[in]  tc          reference time of the polynomials, s
- * @param[in]  dt          spacing of the segment's state vectors, s. The polynomials are evaluated at t - tc
- * whatever the spacing; it is taken for the callers' sake.
+ * @param[in]  dt          spacing of the segment's state vectors, s. Not used: the polynomials are evaluated at
+ *                         t - tc whatever the spacing.
  * @param[in]  t           azimuth time, on the scale of tc
  * @param[in]  tau         two-way range time, > 0
  * @param[in]  fd          Doppler frequency
@@ -81,7 +80,7 @@ typedef struct GrPtGeometry {
  * @param[in]  cx, cy, cz  position polynomials, five coefficients each
  * @param[in]  a, b        equatorial and polar semi-axes, m, > 0
  * @param[out] out         unchanged unless 0 is returned
- * @return 0, or the status of gr_pt(), passed on with an ERROR_CALL_TREE entry. */
+ * @return 0, or the status of gr_pt0(), passed on with an ERROR_CALL_TREE entry. */
 QUO_BASE_API int gr_pt_lat_lon(double tc, double dt, double t, double tau, double fd, double lambda, double side,
                                double omega, const double cx[5], const double cy[5], const double cz[5], double a,
                                double b, GrPtGeometry* out) QUO_NOEXCEPT;

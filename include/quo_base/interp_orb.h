@@ -31,13 +31,20 @@ QUO_BASE_API void POSVELACC_5(double u, const double cx[5], const double cy[5], 
  * @param[in]  dt      spacing, s, not 0 (any value where n is 1)
  * @param[in]  values  n values
  * @param[in]  n       their number, >= 1
- * @param      work    room for n doubles
- * @param[out] c       n coefficients, highest degree first; not one of the other arrays
- * @return 0; 1 for n < 1 or a spacing that is 0 or not finite; 10 where a coefficient is not finite, and c then
- * has no meaning. Nothing is reported. */
-QUO_BASE_API int orbffit(double t0, double dt, const double* values, int n, double* work, double* c) QUO_NOEXCEPT;
+ * @param[out] c       n coefficients, highest degree first; unchanged unless 0 is returned
+ * @return 0; 1 for n < 1 or a spacing that is 0 or not finite; 7 when memory cannot be had; 10 where a value is
+ * not finite or a coefficient would not be.
+ *
+ * The fit is made in a variable that is centred on the span and scaled to it, and expanded once, at the end.
+ *
+ * As stored and evaluated in double precision the polynomial meets the values to rounding up to about n = 20.
+ * Beyond, no such polynomial does: rounding the coefficients of degree 30 alone moves an orbit by metres, at the
+ * state vectors too. The fit then ends at the degree, in the sense of least squares, whose polynomial lies closest
+ * to the values as POSMACRO() evaluates it, and the coefficients above are 0. For a reference time near the
+ * values; one that is many spans away costs digits. */
+QUO_BASE_API int orbffit(double t0, double dt, const double* values, int n, double* c) QUO_NOEXCEPT;
 
-/** Position polynomials of degree n - 1 through n equally spaced state vectors.
+/** Position polynomials through n equally spaced state vectors, fitted axis by axis with orbffit().
  *
  * @param[in]  t0          time of the first state vector, from the polynomials' reference time, s
  * @param[in]  dt          spacing of the state vectors, s
@@ -45,11 +52,8 @@ QUO_BASE_API int orbffit(double t0, double dt, const double* values, int n, doub
  * @param[in]  vel         n x 3 velocities, m/s. Not used, and may be null: n positions fix n coefficients.
  * @param[in]  n           number of state vectors and of coefficients, >= 1
  * @param[out] cx, cy, cz  n coefficients each, highest degree first; unchanged unless 0 is returned
- * @return 0; 7 when memory cannot be had; otherwise the status of orbffit(), passed on with an ERROR_CALL_TREE
- * entry.
- *
- * The polynomial passes through the positions themselves. It is found in a variable scaled and centred on the
- * span, and expanded once, at the end. */
+ * @return 0; 1 for n < 1; 7 when memory cannot be had; otherwise the status of orbffit(), passed on with an
+ *         ERROR_CALL_TREE entry. */
 QUO_BASE_API int orb_interp(double t0, double dt, const double* pos, const double* vel, int n, double* cx,
                             double* cy, double* cz) QUO_NOEXCEPT;
 
