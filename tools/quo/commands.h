@@ -1,0 +1,20 @@
+#ifndef QUO_TOOL_COMMANDS_H
+#define QUO_TOOL_COMMANDS_H
+
+#include <CLI/CLI.hpp>
+#include <functional>
+
+namespace tool {
+
+/** What the chosen subcommand does once the whole command line has been understood; returns the exit status. Every
+ * add_... function declares one subcommand, which sets the job when it is chosen. */
+using Job = std::function<int()>;
+
+void add_geolocate(CLI::App& app, Job& job);
+void add_orbit(CLI::App& app, Job& job);
+void add_time(CLI::App& app, Job& job);
+void add_tiepoints(CLI::App& app, Job& job);
+
+}  // namespace tool
+
+#endif

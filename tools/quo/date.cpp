@@ -1,0 +1,33 @@
+#include "date.h"
+
+#include <cmath>
+
+#include "failure.h"
+#include "number.h"
+#include "quo_base/gen_utils.h"
+
+namespace tool {
+namespace {
+
+constexpr double kYear10000 = 252928915200.0;  // s since 1985
+
+}  // namespace
+
+std::optional<std::string> date_text(double seconds) {
+    if (!(seconds >= 0.0 && seconds < kYear10000)) return std::nullopt;
+    const bool whole_microsecond = finite_number(fixed(seconds, 6)) == seconds;
+    char text[DATE_TEXT_LENGTH + 1];
+    constexpr double kHalfMicrosecond = 0.5e-6;
+    if (sec852myascii(whole_microsecond ? seconds + kHalfMicrosecond : seconds, text) != 0) return std::nullopt;
+    return text;
+}
+
+double seconds_of(const std::string& text) {
+    if (const auto number = finite_number(text)) return *number;
+    DateFields fields;
+    if (date2str(text.c_str(), &fields) != 0)
+        throw WrongUse("\"" + text + "\" is neither seconds nor a date such as \"04-JAN-2022 17:05:58.5\"");
+    return ascii2sec85(text.c_str());
+}
+
+}  // namespace tool

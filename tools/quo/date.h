@@ -1,0 +1,21 @@
+#ifndef QUO_TOOL_DATE_H
+#define QUO_TOOL_DATE_H
+
+#include <optional>
+#include <string>
+
+namespace tool {
+
+/** The long date text of a time in seconds since 1985, or nothing where there is none (before 1985, after 9999).
+ *
+ * The text is cut to microseconds, except where the time is the double closest to a whole microsecond: then it
+ * shows that microsecond. The double of ...16.781409 lies a little below it, and a plain cut would show
+ * ...16.781408. */
+std::optional<std::string> date_text(double seconds);
+
+/** Seconds since 1985 of a number or a date text. Throws WrongUse where the text is neither. */
+double seconds_of(const std::string& text);
+
+}  // namespace tool
+
+#endif

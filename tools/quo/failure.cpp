@@ -1,0 +1,44 @@
+#include "failure.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <cstdio>
+#include <system_error>
+
+#include "quo_base/api.h"
+
+namespace tool {
+
+std::string system_cause() {
+    return std::generic_category().message(errno);
+}
+
+std::string status_text(int status) {
+    struct Meaning {
+        int status;
+        const char* text;
+    };
+    constexpr Meaning kMeanings[] = {
+        {QUO_REFUSED, "refused"},
+        {QUO_READ_FAILED, "data missing or cut short"},
+        {QUO_WRITE_FAILED, "writing failed"},
+        {QUO_NO_MEMORY, "out of memory"},
+        {QUO_NOT_OPENED, "file not opened"},
+        {QUO_NUMERIC, "no solution"},
+        {QUO_NOT_SEEN, "not seen within the orbit"},
+    };
+    const std::string number = std::to_string(status);
+    const auto* known = std::find_if(std::begin(kMeanings), std::end(kMeanings),
+                                     [status](const Meaning& meaning) { return meaning.status == status; });
+    return known == std::end(kMeanings) ? number : number + " (" + known->text + ")";
+}
+
+void complain(const std::string& message) {
+    std::string line = "quo: " + message;
+    std::replace_if(
+        line.begin(), line.end(), [](unsigned char c) { return c < ' ' || c == 0x7F; }, ' ');
+    line += '\n';
+    std::fwrite(line.data(), 1, line.size(), stderr);
+}
+
+}  // namespace tool

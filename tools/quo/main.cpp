@@ -1,0 +1,51 @@
+#include <cstdio>
+#include <new>
+
+#include "commands.h"
+#include "failure.h"
+#include "interrupt.h"
+
+namespace {
+
+constexpr const char* kAbout =
+    "Radar geometry from the headers of synthetic aperture radar products: orbits, geolocation, times.\n"
+    "Times are seconds since 1 January 1985 without leap seconds, range times are two-way.";
+constexpr const char* kFooter =
+    "Exit status: 0 fine; 1 a job that failed, rows without a solution, or findings; 2 wrong use.";
+
+int run(int argc, char** argv) {
+    CLI::App app{kAbout, "quo"};
+    app.footer(kFooter);
+    app.set_version_flag("--version", "quo " QUO_TOOL_VERSION);
+    app.require_subcommand(1);
+    tool::Job job;
+    tool::add_geolocate(app, job);
+    tool::add_orbit(app, job);
+    tool::add_time(app, job);
+    tool::add_tiepoints(app, job);
+    try {
+        app.parse(argc, argv);
+    } catch (const CLI::ParseError& error) {
+        if (error.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success)) return app.exit(error);
+        throw tool::WrongUse(error.what());
+    }
+    return job();
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    try {
+        return run(argc, argv);
+    } catch (const tool::Interrupted& interrupted) {
+        tool::end_by(interrupted.signal);
+    } catch (const tool::WrongUse& wrong) {
+        tool::complain(std::string{wrong.what()} + " (see quo --help)");
+        return tool::kWrongUse;
+    } catch (const std::bad_alloc&) {
+        tool::complain("out of memory");
+    } catch (const std::exception& failure) {
+        tool::complain(failure.what());
+    }
+    return tool::kFindings;
+}

@@ -1,0 +1,47 @@
+#include "number.h"
+
+#include <charconv>
+#include <cmath>
+
+namespace tool {
+
+void append_exact(std::string& text, double value) {
+    char room[32];  // a sign, 17 digits, a point and an exponent of five characters
+    const auto [end, error] = std::to_chars(std::begin(room), std::end(room), value);
+    if (error == std::errc{}) text.append(room, end);
+}
+
+std::string exact(double value) {
+    std::string text;
+    append_exact(text, value);
+    return text;
+}
+
+std::string fixed(double value, int decimals) {
+    char room[400];  // 309 digits before the point at most
+    const auto [end, error] =
+        std::to_chars(std::begin(room), std::end(room), value, std::chars_format::fixed, decimals);
+    return error == std::errc{} ? std::string{room, end} : exact(value);
+}
+
+std::string rough(double value) {
+    char room[32];
+    const auto [end, error] =
+        std::to_chars(std::begin(room), std::end(room), value, std::chars_format::general, 3);
+    return error == std::errc{} ? std::string{room, end} : exact(value);
+}
+
+std::optional<double> finite_number(std::string_view text) {
+    constexpr std::string_view kBlanks = " \t";
+    const std::size_t first = text.find_first_not_of(kBlanks);
+    if (first == std::string_view::npos) return std::nullopt;
+    text = text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
+    if (text.size() > 1 && text[0] == '+' && text[1] != '-') text.remove_prefix(1);
+
+    double value = 0.0;
+    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
+    if (error != std::errc{} || end != text.data() + text.size() || !std::isfinite(value)) return std::nullopt;
+    return value;
+}
+
+}  // namespace tool

@@ -1,0 +1,26 @@
+#ifndef QUO_TOOL_NUMBER_H
+#define QUO_TOOL_NUMBER_H
+
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace tool {
+
+/** Appends the shortest text that reads back to the same double; locale-independent. */
+void append_exact(std::string& text, double value);
+std::string exact(double value);
+
+/** The value with a fixed number of decimals. */
+std::string fixed(double value, int decimals);
+
+/** The value with three significant digits, for people. */
+std::string rough(double value);
+
+/** The number that the whole text is, blanks around it and a leading plus sign allowed. Nothing for anything else,
+ * and for infinity and not-a-number, which no computation here can use. */
+std::optional<double> finite_number(std::string_view text);
+
+}  // namespace tool
+
+#endif

@@ -1,0 +1,39 @@
+#ifndef QUO_TOOL_OUTPUT_H
+#define QUO_TOOL_OUTPUT_H
+
+#include <string>
+#include <string_view>
+
+namespace tool {
+
+/** Where a result goes: standard output for "-", else a file that appears under its name in one step.
+ *
+ * A file is written beside its final name and renamed by commit(); whatever happens before, an older file of that
+ * name stays whole and the unfinished one is taken away. A name that is no regular file (a pipe, a device) is
+ * written to directly. Throws Failure where writing fails, and Interrupted. */
+class Output {
+public:
+    explicit Output(const std::string& name);
+    ~Output();
+    Output(const Output&) = delete;
+    Output& operator=(const Output&) = delete;
+
+    void write(std::string_view text);
+    /** Hands on what is still buffered, so that someone who watches sees it. */
+    void flush();
+    /** The result is complete. */
+    void commit();
+
+private:
+    void open_unfinished();
+    void give_permissions() const;
+    [[noreturn]] void fail() const;
+
+    std::string name_, target_, unfinished_;  // unfinished_ is empty where the output is written to directly
+    int descriptor_ = -1;
+    std::string pending_;
+};
+
+}  // namespace tool
+
+#endif

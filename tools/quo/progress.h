@@ -1,0 +1,34 @@
+#ifndef QUO_TOOL_PROGRESS_H
+#define QUO_TOOL_PROGRESS_H
+
+#include <chrono>
+#include <cstdint>
+
+namespace tool {
+
+/** A bar on standard error for jobs that somebody waits for: it shows itself only on a terminal and only when the
+ * job takes longer than half a second, and is wiped away at the end. */
+class Progress {
+public:
+    Progress();
+    ~Progress();
+    Progress(const Progress&) = delete;
+    Progress& operator=(const Progress&) = delete;
+
+    /** `done` of `in_all`; in_all 0 where the end is not known, and then the rows are counted instead. */
+    void show(std::int64_t done, std::int64_t in_all, std::int64_t rows);
+    /** Takes the bar away, so that a message can stand in its place. */
+    void wipe();
+
+private:
+    using Clock = std::chrono::steady_clock;
+
+    bool terminal_;
+    bool visible_ = false;
+    unsigned calls_ = 0;
+    Clock::time_point next_;
+};
+
+}  // namespace tool
+
+#endif

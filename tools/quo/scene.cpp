@@ -1,0 +1,108 @@
+#include "scene.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+
+#include "failure.h"
+#include "number.h"
+#include "quo_base/acquisition.h"
+#include "quo_base/dataset_info.h"
+
+namespace tool {
+namespace {
+
+// The library answers for a file that is not there as for one that lacks the section; the user wants to know
+// which.
+void require_readable(const std::string& name) {
+    const int descriptor = open(name.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK);
+    struct stat about {};
+    if (descriptor < 0 || fstat(descriptor, &about) != 0) throw Failure(name + ": " + system_cause());
+    close(descriptor);
+    if (!S_ISREG(about.st_mode)) throw Failure(name + ": not a regular file");
+}
+
+std::vector<std::string> check(const GeneralSAROrbit& orbit) {
+    std::vector<SVFinding> findings;
+    std::vector<std::string> texts;
+    if (orbit.SVCheck(findings) != 0) return {"the state vectors cannot be checked"};
+    for (const SVFinding& finding : findings) texts.emplace_back(finding.text);
+    return texts;
+}
+
+/** Why the model of a header's orbit cannot be built: what is wrong with the vectors, where they can be read at
+ * all. */
+std::string why_no_orbit(const char* header, int status) {
+    SAROrbitStateVectors_Obj vectors;
+    if (vectors.readhdr(header) != 0 || vectors.nSV_n < 1) return "no state vectors that can be read";
+    GeneralSAROrbit orbit;
+    const auto values = static_cast<std::ptrdiff_t>(vectors.nSV_n) * 3;
+    if (orbit.SVCreate(vectors.t0SV_s, vectors.dtSV_s, vectors.nSV_n) != 0)
+        return std::to_string(vectors.nSV_n) + " state vectors, at least 5 are needed";
+    std::copy_n(vectors.pSV_m, values, orbit.pSV_m);
+    std::copy_n(vectors.vSV_mOs, values, orbit.vSV_mOs);
+    const auto findings = check(orbit);
+    return findings.empty() ? "no orbit from the state vectors, status " + status_text(status) : findings.front();
+}
+
+}  // namespace
+
+Scene::Scene(const std::string& header) : name_{header} {
+    require_readable(name_);
+    read_orbit();
+    read_sampling();
+    read_look_side();
+}
+
+void Scene::read_orbit() {
+    if (const int status = orbit_.readhdr(name_.c_str()))
+        throw Failure(name_ + ": " + why_no_orbit(name_.c_str(), status));
+}
+
+void Scene::read_sampling() {
+    SamplingConstants_Obj sampling;
+    if (sampling.readhdr(name_.c_str()) == 0 && sampling.lambda_m > 0.0) use_wavelength(sampling.lambda_m);
+}
+
+void Scene::read_look_side() {
+    DataSetInfo_Obj data_set;
+    if (data_set.readhdr(name_.c_str()) == 0) use_look_sign(data_set.LookDirection);
+}
+
+void Scene::use_wavelength(double wavelength_m) {
+    if (orbit_.setLambda(wavelength_m) != 0) throw WrongUse("a wavelength of " + exact(wavelength_m) + " m");
+    wavelength_m_ = wavelength_m;
+}
+
+void Scene::use_look_sign(int sign) {
+    orbit_.setLookSign(sign);
+    look_sign_ = sign;
+}
+
+void Scene::require_wavelength() const {
+    if (!wavelength_m_) throw Failure(name_ + ": no wavelength (SamplingConstants/lambda_m); give --wavelength");
+}
+
+void Scene::require_look_side() const {
+    if (!look_sign_) throw Failure(name_ + ": no look side (DataSetInfo/LookDirection); give --look");
+}
+
+void Scene::resample(double spacing_s) {
+    const int status = orbit_.SVResample(spacing_s);
+    if (status == QUO_REFUSED) throw WrongUse("state vectors " + exact(spacing_s) + " s apart");
+    if (status != 0) throw Failure(name_ + ": cannot re-sample the state vectors, status " + status_text(status));
+}
+
+bool Scene::covers(double time_s) const {
+    constexpr double kLeeway = 1e-4;  // s
+    return time_s >= first_time() - kLeeway && time_s <= last_time() + kLeeway;
+}
+
+std::vector<std::string> Scene::findings() const {
+    return check(orbit_);
+}
+
+}  // namespace tool

@@ -1,0 +1,56 @@
+#ifndef QUO_TOOL_SCENE_H
+#define QUO_TOOL_SCENE_H
+
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "quo_base/generalSARorbit.h"
+
+namespace tool {
+
+/** What a product header says about the geometry: its orbit, with wavelength and look side already set where the
+ * header knows them. Options of the command line take precedence. */
+class Scene {
+public:
+    /** Reads a header. Throws Failure where the file cannot be read or holds no usable orbit. */
+    explicit Scene(const std::string& header);
+
+    const std::string& name() const { return name_; }
+    GeneralSAROrbit& orbit() { return orbit_; }
+
+    /** Sets the wavelength in m; throws WrongUse where it is not above 0. */
+    void use_wavelength(double wavelength_m);
+    void use_look_sign(int sign);
+    std::optional<double> wavelength_m() const { return wavelength_m_; }
+    std::optional<int> look_sign() const { return look_sign_; }
+    /** Throws Failure where neither header nor option told it: a guess would give plausible wrong numbers. */
+    void require_wavelength() const;
+    void require_look_side() const;
+
+    /** Brings the state vectors to at most so many seconds apart; see GeneralSAROrbit::SVResample. */
+    void resample(double spacing_s);
+
+    double first_time() const { return orbit_.t0SV_s; }
+    double last_time() const { return orbit_.t0SV_s + orbit_.dtSV_s * (orbit_.nSV_n - 1); }
+    /** Whether the time lies between the first and the last state vector, with the 1e-4 s of leeway that the
+     * inverse geolocation gives. Beyond, the orbit would be extrapolated. */
+    bool covers(double time_s) const;
+
+    /** What is wrong with the state vectors, in words. */
+    std::vector<std::string> findings() const;
+
+private:
+    void read_orbit();
+    void read_sampling();
+    void read_look_side();
+
+    std::string name_;
+    GeneralSAROrbit orbit_;
+    std::optional<double> wavelength_m_;
+    std::optional<int> look_sign_;
+};
+
+}  // namespace tool
+
+#endif

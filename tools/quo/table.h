@@ -1,0 +1,60 @@
+#ifndef QUO_TOOL_TABLE_H
+#define QUO_TOOL_TABLE_H
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "input.h"
+
+namespace tool {
+
+/** Takes a line of comma-separated values apart. The fields point into the line and keep their quotes.
+ *
+ * @return false where a quote is left open or something follows a closing quote; the rest of the line is then the
+ * last field */
+bool split_fields(std::string_view line, std::vector<std::string_view>& fields);
+
+/** A table in text: comment lines (they begin with '#'), a line of column names, then one row per line, all of
+ * comma-separated values. Values that hold a comma stand in double quotes; a row never spans lines. Empty lines
+ * and comment lines are skipped wherever they stand; a byte order mark at the start is too. */
+class Table {
+public:
+    /** Reads up to the column names. Throws Failure where there are none. */
+    explicit Table(const std::string& name);
+
+    const std::vector<std::string>& columns() const { return columns_; }
+    /** The comments before the column names, without '#' and the blanks around. */
+    const std::vector<std::string>& comments() const { return comments_; }
+    /** Index of a column. Throws Failure where two columns have that name. */
+    std::optional<std::size_t> find(std::string_view column) const;
+    /** The same for a column that must be there; throws Failure where it is not. */
+    std::size_t need(std::string_view column) const;
+
+    /** Goes to the next row; false at the end. */
+    bool next();
+    /** The row's line as it stands, and its fields. */
+    std::string_view line() const { return line_; }
+    const std::vector<std::string_view>& fields() const { return fields_; }
+    bool well_quoted() const { return well_quoted_; }
+    /** What is wrong with the row's shape, or nothing. */
+    std::optional<std::string> defect() const;
+    /** "file: line 17", for messages about the row. */
+    std::string place() const;
+
+    const LineReader& input() const { return input_; }
+
+private:
+    LineReader input_;
+    std::vector<std::string> columns_, comments_;
+    std::string line_;
+    std::vector<std::string_view> fields_;
+    bool well_quoted_ = true;
+};
+
+}  // namespace tool
+
+#endif

@@ -1,0 +1,247 @@
+#include <algorithm>
+#include <array>
+#include <cmath>
+#include <memory>
+#include <nlohmann/json.hpp>
+
+#include "commands.h"
+#include "earth.h"
+#include "failure.h"
+#include "number.h"
+#include "output.h"
+#include "quo_base/gr_pt.h"
+#include "scene.h"
+#include "table.h"
+
+namespace tool {
+namespace {
+
+struct TiepointsOptions {
+    std::vector<std::string> headers;
+    std::string points, incidence;
+    bool json = false;
+};
+
+/** A ground point whose place in the image is known from elsewhere. */
+struct TiePoint {
+    double time_s, range_s;
+    Geodetic ground;
+    double incidence_deg;
+};
+
+/** What an incidence angle is measured against. The missions differ, by up to 0.04 degrees seen from orbit. */
+enum class Vertical { kEllipsoidNormal, kGeocentricRadius };
+
+/** The differences of one quantity over all points. */
+class Spread {
+public:
+    void add(double difference) {
+        largest_ = std::max(largest_, std::abs(difference));
+        squares_ += difference * difference;
+        ++count_;
+    }
+    double largest() const { return largest_; }
+    double rms() const { return count_ > 0 ? std::sqrt(squares_ / static_cast<double>(count_)) : 0.0; }
+
+private:
+    double largest_ = 0.0, squares_ = 0.0;
+    std::int64_t count_ = 0;
+};
+
+constexpr std::size_t kQuantities = 4;
+struct Quantity {
+    const char *heading, *key;
+};
+constexpr std::array<Quantity, kQuantities> kQuantity{{{"azimuth time, us", "azimuth_time_us"},
+                                                       {"slant range, m", "slant_range_m"},
+                                                       {"ground position, m", "ground_position_m"},
+                                                       {"incidence, deg", "incidence_deg"}}};
+
+/** How well a scene's geometry meets its tie points. */
+struct Agreement {
+    std::string scene;
+    Vertical vertical = Vertical::kEllipsoidNormal;
+    std::int64_t points = 0, unsolved = 0;
+    std::array<Spread, kQuantities> spreads;  // in the order of kQuantity
+};
+
+/** The ground point of a sample at a height above the ellipsoid.
+ *
+ * The surface of a constant height is no ellipsoid, but differs from the one with axes as much longer by
+ * millimetres only. So the axes are corrected by the height that the point then has; two corrections leave
+ * nothing. */
+int ground_at_height(GeneralSAROrbit& orbit, const TiePoint& tie, Vector& point) {
+    constexpr int kRounds = 3;
+    Vector position_m{};
+    Vector velocity_m_s{};
+    int status = orbit.SVGetPos(tie.time_s, position_m.v);
+    if (status == 0) status = orbit.SVGetVel(tie.time_s, velocity_m_s.v);
+    double raised_m = tie.ground.height_m;
+    for (int round = 0; round < kRounds && status == 0; ++round) {
+        status = gr_pt(point.v, position_m.v, velocity_m_s.v, tie.range_s, 0.0, orbit.getLambda(), 0.0,
+                       orbit.getLookSign(), kSemiMajor + raised_m, kSemiMinor + raised_m);
+        if (status == 0) raised_m += tie.ground.height_m - height_of(point);
+    }
+    return status;
+}
+
+double incidence_deg(GeneralSAROrbit& orbit, const TiePoint& tie, const Vector& point, Vertical vertical) {
+    const double* platform = orbit.SVGetPos(tie.time_s);
+    const Vector line_of_sight = Vector{{platform[0], platform[1], platform[2]}} - point;
+    return angle_deg(line_of_sight, vertical == Vertical::kGeocentricRadius ? point : normal(tie.ground));
+}
+
+int compare(GeneralSAROrbit& orbit, const TiePoint& tie, Agreement& agreement) {
+    const Vector truth = position(tie.ground);
+    double time_s = 0.0;
+    double range_s = 0.0;
+    Vector point{};
+    int status = orbit.earth2sat(truth.v, &time_s, &range_s);
+    if (status == 0) status = ground_at_height(orbit, tie, point);
+    if (status != 0) return status;
+
+    agreement.spreads[0].add((time_s - tie.time_s) * 1e6);
+    agreement.spreads[1].add((range_s - tie.range_s) * 0.5 * kLightSpeed);
+    agreement.spreads[2].add(norm(point - truth));
+    agreement.spreads[3].add(incidence_deg(orbit, tie, point, agreement.vertical) - tie.incidence_deg);
+    return 0;
+}
+
+/** The numbers of a row; throws Failure where one is missing, since a truth with holes proves nothing. */
+TiePoint tie_point(const Table& table, const std::array<std::size_t, 6>& columns) {
+    std::array<double, 6> values{};
+    if (const auto defect = table.defect()) throw Failure(table.place() + ": " + *defect);
+    for (std::size_t i = 0; i < columns.size(); ++i) {
+        const std::string_view text = table.fields()[columns[i]];
+        const auto number = finite_number(text);
+        if (!number)
+            throw Failure(table.place() + ": " + table.columns()[columns[i]] + " is \"" + std::string{text} +
+                          "\", not a number");
+        values[i] = *number;
+    }
+    return {values[0], values[1], {values[2], values[3], values[4]}, values[5]};
+}
+
+Vertical vertical_of(const Table& table, const std::string& option) {
+    const auto says = [&](const char* text) {
+        const auto& comments = table.comments();
+        return std::find(comments.begin(), comments.end(), text) != comments.end();
+    };
+    const bool geocentric = option.empty() ? says("incidence: geocentric radius") : option == "geocentric";
+    return geocentric ? Vertical::kGeocentricRadius : Vertical::kEllipsoidNormal;
+}
+
+/** The tie points that stand beside a header: scene_tie_points.csv beside scene.xml. */
+std::string points_beside(const std::string& header) {
+    const std::size_t dot = header.rfind('.');
+    const std::size_t slash = header.rfind('/');
+    const bool extension = dot != std::string::npos && (slash == std::string::npos || dot > slash);
+    return header.substr(0, extension ? dot : header.size()) + "_tie_points.csv";
+}
+
+std::string scene_name(const std::string& header) {
+    const std::string file = header.substr(header.rfind('/') + 1);
+    return file.substr(0, file.rfind('.'));
+}
+
+Agreement check_scene(const std::string& header, const TiepointsOptions& options) {
+    Scene scene{header};
+    scene.require_look_side();
+    scene.require_wavelength();
+    Table table{options.points.empty() ? points_beside(header) : options.points};
+    const std::array<std::size_t, 6> columns{table.need("azimuth_time_s"), table.need("range_time_s"),
+                                             table.need("latitude_deg"),   table.need("longitude_deg"),
+                                             table.need("height_m"),       table.need("incidence_deg")};
+    Agreement agreement{
+        .scene = scene_name(header), .vertical = vertical_of(table, options.incidence), .spreads = {}};
+    while (table.next()) {
+        ++agreement.points;
+        const int status = compare(scene.orbit(), tie_point(table, columns), agreement);
+        if (status == 0) continue;
+        ++agreement.unsolved;
+        complain(table.place() + ": status " + status_text(status));
+    }
+    return agreement;
+}
+
+std::string padded(const std::string& text, std::size_t width) {
+    return text.size() < width ? std::string(width - text.size(), ' ') + text : text;
+}
+
+constexpr std::size_t kNumberWidth = 11;
+
+std::string as_row(const Agreement& agreement, std::size_t name_width) {
+    std::string row = agreement.scene + std::string(name_width - agreement.scene.size(), ' ') +
+                      padded(std::to_string(agreement.points), 8);
+    for (const Spread& spread : agreement.spreads)
+        row += padded(rough(spread.largest()), kNumberWidth) + padded(rough(spread.rms()), kNumberWidth);
+    return row + "\n";
+}
+
+std::string as_text(const std::vector<Agreement>& list) {
+    std::size_t name_width = 5;
+    for (const Agreement& agreement : list) name_width = std::max(name_width, agreement.scene.size());
+    std::string first(name_width + 8, ' ');
+    std::string second = "scene" + std::string(name_width - 5, ' ') + "  points";
+    for (const Quantity& quantity : kQuantity) {
+        first += padded(quantity.heading, 2 * kNumberWidth);
+        second += padded("largest", kNumberWidth) + padded("rms", kNumberWidth);
+    }
+    std::string text = first + "\n" + second + "\n";
+    for (const Agreement& agreement : list) text += as_row(agreement, name_width);
+    return text;
+}
+
+std::string as_json(const std::vector<Agreement>& list) {
+    nlohmann::ordered_json json = nlohmann::ordered_json::array();
+    for (const Agreement& agreement : list) {
+        const bool geocentric = agreement.vertical == Vertical::kGeocentricRadius;
+        nlohmann::ordered_json entry{{"scene", agreement.scene},
+                                     {"points", agreement.points},
+                                     {"without_solution", agreement.unsolved},
+                                     {"incidence_against", geocentric ? "geocentric radius" : "ellipsoid normal"}};
+        for (std::size_t i = 0; i < kQuantities; ++i)
+            entry[kQuantity[i].key] = {{"largest", agreement.spreads[i].largest()},
+                                       {"rms", agreement.spreads[i].rms()}};
+        json.push_back(entry);
+    }
+    return json.dump(2) + "\n";
+}
+
+int check_tiepoints(const TiepointsOptions& options) {
+    if (!options.points.empty() && options.headers.size() > 1)
+        throw WrongUse("--points belongs to a single header");
+    std::vector<Agreement> list;
+    for (const std::string& header : options.headers) list.push_back(check_scene(header, options));
+    Output output{"-"};
+    output.write(options.json ? as_json(list) : as_text(list));
+    output.commit();
+    const bool all_solved =
+        std::all_of(list.begin(), list.end(), [](const Agreement& a) { return a.unsolved == 0; });
+    return all_solved ? kFine : kFindings;
+}
+
+constexpr const char* kAbout =
+    "Compares a header's geometry with tie points: ground points whose image time and range are known from\n"
+    "elsewhere. Azimuth time and slant range are found from the ground point, ground position and incidence\n"
+    "from time and range at the point's height. Reads azimuth_time_s, range_time_s, latitude_deg,\n"
+    "longitude_deg, height_m and incidence_deg from SCENE_tie_points.csv beside SCENE.xml.";
+
+}  // namespace
+
+void add_tiepoints(CLI::App& app, Job& job) {
+    auto options = std::make_shared<TiepointsOptions>();
+    CLI::App* command = app.add_subcommand("tiepoints", kAbout);
+    command->add_option("HEADER", options->headers, "Product headers")->required();
+    command->add_option("--points", options->points, "Tie points of the one header given");
+    command
+        ->add_option(
+            "--incidence", options->incidence,
+            "What the incidence is measured against; else as the comment \"incidence: geocentric radius\" or "
+            "\"incidence: ellipsoid normal\" says")
+        ->check(CLI::IsMember({"normal", "geocentric"}));
+    command->add_flag("--json", options->json, "Print JSON");
+    command->callback([options, &job] { job = [options] { return check_tiepoints(*options); }; });
+}
+
+}  // namespace tool
