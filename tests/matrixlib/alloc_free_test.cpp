@@ -1,0 +1,135 @@
+#include "quo_base/alloc_free.h"
+
+#include <gtest/gtest.h>
+
+#include <climits>
+#include <cstdint>
+#include <numeric>
+
+#include "support/diagnostics.h"
+
+namespace {
+
+struct Range {
+    int low, high;
+};
+constexpr Range kRanges[] = {{1, 7}, {0, 6}, {-5, 3}, {1000003, 1000017}, {4, 3}};
+
+// Every element is written, so that the sanitizer sees a block that is too short, and the report sees a leak.
+template <typename T, typename Free>
+void fill_and_release(T* v, const Range& range, Free release) {
+    ASSERT_NE(v, nullptr);
+    for (int i = range.low; i <= range.high; ++i) v[i] = T(i % 100);
+    for (int i = range.low; i <= range.high; ++i) EXPECT_EQ(v[i], T(i % 100));
+    release(v, range.low, range.high);
+}
+
+TEST(Vectors, HoldTheirRangeAndAreReleased) {
+    const test::Report report;
+    for (const Range& range : kRanges) {
+        SCOPED_TRACE(range.low);
+        fill_and_release(vector(range.low, range.high), range, free_vector);
+        fill_and_release(ivector(range.low, range.high), range, free_ivector);
+        fill_and_release(lvector(range.low, range.high), range, free_lvector);
+        fill_and_release(dvector(range.low, range.high), range, free_dvector);
+        fill_and_release(ldvector(range.low, range.high), range, free_ldvector);
+        fill_and_release(cvector(range.low, range.high), range, free_cvector);
+    }
+}
+
+template <typename T>
+struct Matrices {
+    T** (*make)(int, int, int, int) noexcept;
+    void (*release)(T**, int, int, int, int) noexcept;
+};
+
+template <typename T>
+void check_matrix(const Matrices<T>& functions) {
+    const test::Report report;
+    T** m = functions.make(-2, 1, 3, 8);
+    ASSERT_NE(m, nullptr);
+    int next = 0;
+    for (int i = -2; i <= 1; ++i) {
+        for (int j = 3; j <= 8; ++j) m[i][j] = static_cast<T>(static_cast<float>(next++));
+    }
+    const T* data = m[-2] + 3;
+    for (int k = 0; k < 4 * 6; ++k)
+        EXPECT_EQ(data[k], static_cast<T>(static_cast<float>(k))) << "row-major without gaps";
+    functions.release(m, -2, 1, 3, 8);
+}
+
+TEST(Matrices, AreRowMajorWithoutGapsAndAreReleased) {
+    check_matrix<float>({matrix, free_matrix});
+    check_matrix<int>({imatrix, free_imatrix});
+    check_matrix<double>({dmatrix, free_dmatrix});
+    check_matrix<double>({ldmatrix, free_ldmatrix});
+    check_matrix<fcomplex>({cmatrix, free_cmatrix});
+}
+
+TEST(Tensor, IsOneRowMajorArray) {
+    const test::Report report;
+    float*** t = f3tensor(2, 4, -1, 0, 5, 9);
+    ASSERT_NE(t, nullptr);
+    float next = 0.0F;
+    for (int i = 2; i <= 4; ++i) {
+        for (int j = -1; j <= 0; ++j) {
+            for (int k = 5; k <= 9; ++k) t[i][j][k] = next++;
+        }
+    }
+    const float* data = t[2][-1] + 5;
+    for (int k = 0; k < 3 * 2 * 5; ++k) EXPECT_EQ(data[k], static_cast<float>(k));
+    free_f3tensor(t, 2, 4, -1, 0, 5, 9);
+}
+
+TEST(RowPointers, AddressTheMatrixUnderThem) {
+    const test::Report report;
+    float data[12];
+    std::iota(data, data + 12, 0.0F);
+    float** whole = convert_matrix(data, 1, 3, 1, 4);
+    ASSERT_NE(whole, nullptr);
+    EXPECT_EQ(&whole[1][1], data);
+    EXPECT_EQ(whole[3][4], 11.0F);
+
+    float** part = submatrix(whole, 2, 3, 3, 4, 11, 21);
+    ASSERT_NE(part, nullptr);
+    EXPECT_EQ(&part[11][21], &whole[2][3]);
+    EXPECT_EQ(&part[12][22], &whole[3][4]);
+    free_submatrix(part, 11, 12, 21, 22);
+    free_convert_matrix(whole, 1, 3, 1, 4);
+}
+
+TEST(Allocators, RefuseWhatCannotBeWhileTracking) {
+    const test::Report report;
+    EXPECT_EQ(dvector(1, -1), nullptr);
+    EXPECT_EQ(dvector(5, INT_MIN), nullptr);
+    EXPECT_EQ(matrix(1, 0, 1, 4), nullptr);
+    EXPECT_EQ(matrix(1, 3, 1, -1), nullptr);
+    EXPECT_EQ(dmatrix(INT_MIN, INT_MAX, INT_MIN, INT_MAX), nullptr);
+    EXPECT_EQ(f3tensor(1, INT_MAX, 1, INT_MAX, 1, INT_MAX), nullptr);
+    EXPECT_EQ(f3tensor(1, 2, 1, 0, 1, 2), nullptr);
+    EXPECT_EQ(convert_matrix(nullptr, 1, 0, 3, 1), nullptr);
+}
+
+// A failing second or third block must not leave the first ones behind.
+TEST(Allocators, LeaveNothingWhenABlockCannotBeHad) {
+    const test::Report report;
+    test::fail_every_allocation([] {
+        double** m = dmatrix(1, 3, 1, 4);
+        if (!m) return 7;
+        free_dmatrix(m, 1, 3, 1, 4);
+        return 0;
+    });
+    test::fail_every_allocation([] {
+        float*** t = f3tensor(1, 2, 1, 3, 1, 4);
+        if (!t) return 7;
+        free_f3tensor(t, 1, 2, 1, 3, 1, 4);
+        return 0;
+    });
+}
+
+TEST(AllocatorsDeathTest, EndTheProcessWithStatusZeroWhileNotTracking) {
+    EXPECT_EXIT(static_cast<void>(dvector(1, -1)), testing::ExitedWithCode(0), "^$");
+    EXPECT_EXIT(static_cast<void>(dmatrix(1, INT_MAX, 1, INT_MAX)), testing::ExitedWithCode(0), "");
+}
+
+}  // namespace
