@@ -1,0 +1,184 @@
+#include "quo_base/quorelReport.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <cerrno>
+#include <cmath>
+#include <cstring>
+#include <string>
+
+#include "support/diagnostics.h"
+
+namespace {
+
+TEST(QuorelException, KeepsMessageAndPosition) {
+    errno = ENOENT;
+    const quorelException generic;
+    EXPECT_STREQ(generic.what(), "generic quorel exception.\n");
+    EXPECT_EQ(generic.getLine(), 0);
+    EXPECT_STREQ(generic.getFunction(), "");
+    EXPECT_STREQ(generic.getFile(), "");
+    EXPECT_EQ(generic.getErrorNumber(), ENOENT);
+
+    const quorelException placed{17, "focus", "chain.cpp"};
+    EXPECT_STREQ(placed.what(), "chain.cpp: focus (17): exception found");
+    EXPECT_EQ(placed.getErrorNumber(), ENOENT);
+
+    const quorelException whole{17, "focus", "chain.cpp", "no 100%s luck"};
+    EXPECT_STREQ(whole.what(), "no 100%s luck");
+    EXPECT_EQ(whole.getLine(), 17);
+    EXPECT_STREQ(whole.getFunction(), "focus");
+    EXPECT_STREQ(whole.getFile(), "chain.cpp");
+    EXPECT_EQ(whole.getErrorNumber(), 0);
+
+    const quorelException bare{"alone"};
+    EXPECT_STREQ(bare.what(), "alone");
+    EXPECT_EQ(bare.getLine(), -1);
+    EXPECT_STREQ(bare.getFunction(), "UNKNOWN FUNCTION");
+    EXPECT_STREQ(bare.getFile(), "UNKNOWN FILE");
+    EXPECT_EQ(bare.getErrorNumber(), 0);
+    errno = 0;
+}
+
+TEST(QuorelException, CutsEveryTextAt511Bytes) {
+    const std::string endless(5000, 'x');
+    const quorelException e{1, endless.c_str(), endless.c_str(), endless.c_str()};
+    EXPECT_EQ(std::strlen(e.what()), 511U);
+    EXPECT_EQ(std::strlen(e.getFunction()), 511U);
+    EXPECT_EQ(std::strlen(e.getFile()), 511U);
+    EXPECT_EQ(std::strlen(quorelException(1, endless.c_str(), endless.c_str()).what()), 511U);
+    EXPECT_STREQ(quorelException(1, nullptr, nullptr, nullptr).what(), "");
+}
+
+TEST(QuorelReport, WritesEntriesOfEveryForm) {
+    const test::CapturedStderr silent;
+    const test::Report open;
+    quorelReport report;
+    quorelReport::addEntry(QUO_WARNING, 17, "chain.cpp", "focus", "%d of %s", 3, "seven");
+    report.addEntry("no kind %d", 5);
+    report.addEntry(QUO_CHECKPOINT, "half %s", "way");
+    const quorelException exception{9, "scan", "io.cpp", "100%s %n done"};
+    quorelReport::addEntry(&exception);
+    report.end_report();
+
+    const auto entries = open.entries();
+    ASSERT_EQ(entries.size(), 5U);
+    EXPECT_EQ(entries[0].kind, "WARNING");
+    EXPECT_EQ(entries[0].message, "3 of seven");
+    EXPECT_EQ(entries[0].file, "chain.cpp");
+    EXPECT_EQ(entries[0].function, "focus");
+    EXPECT_EQ(entries[0].line, 17);
+    EXPECT_EQ(entries[1].kind, "UNKNOWN");
+    EXPECT_EQ(entries[1].message, "no kind 5");
+    EXPECT_EQ(entries[1].file, "UNKNOWN");
+    EXPECT_EQ(entries[1].function, "UNKNOWN");
+    EXPECT_EQ(entries[1].line, 0);
+    EXPECT_EQ(entries[2].kind, "CHECKPOINT");
+    EXPECT_EQ(entries[2].message, "half way");
+    EXPECT_EQ(entries[3].kind, "ERROR");
+    EXPECT_EQ(entries[3].message, "100%s %n done");
+    EXPECT_EQ(entries[3].line, 9);
+    EXPECT_EQ(entries[4].kind, "CHECKPOINT");
+    EXPECT_EQ(entries[4].message, "End of processing");
+}
+
+TEST(QuorelReport, CutsLongMessagesAndStaysSilentWhileClosed) {
+    quorelReport report;
+    report.addEntry("dropped %d", 1);
+    report.addLog("dropped %d", 2);
+    const test::Report open;
+    report.addEntry(QUO_WARNING, "%s", std::string(100000, 'x').c_str());
+    const auto messages = open.messages("WARNING");
+    ASSERT_EQ(messages.size(), 1U);
+    EXPECT_EQ(messages[0], std::string(2047, 'x'));
+}
+
+TEST(QuorelReport, ChecksErrnoOnce) {
+    const test::Report open;
+    errno = ENOENT;
+    quorelReport::checkErrno(5, "focus", "chain.cpp");
+    EXPECT_EQ(errno, 0);
+    quorelReport::checkErrno(6, "focus", "chain.cpp");
+    const auto messages = open.messages("WARNING");
+    ASSERT_EQ(messages.size(), 1U);
+    EXPECT_EQ(messages[0], "errno 2 (" + std::string{std::strerror(ENOENT)} + ")");
+}
+
+TEST(QuorelReport, OpensOnceByNameAndWarnsOfChanges) {
+    const test::TemporaryFolder folder;
+    const std::string first = folder.file("first.txt"), second = folder.file("second.txt");
+    quorelReport report;
+    report.setLevel(2);  // no name yet
+    EXPECT_EQ(report.getLevel(), 0);
+    report.setReportName(first.c_str());
+    EXPECT_EQ(report.getLevel(), 1);
+    EXPECT_STREQ(report.getReportName(), first.c_str());
+    report.setReportName(second.c_str());
+    report.setLevel(2);
+    EXPECT_EQ(report.getLevel(), 1);
+    EXPECT_STREQ(report.getReportName(), first.c_str());
+    EXPECT_THAT(test::read_text(first), testing::HasSubstr("Cannot change report FILENAME!"));
+    EXPECT_THAT(test::read_text(first), testing::HasSubstr("Cannot change report LEVEL!"));
+    EXPECT_EQ(test::read_text(second), "");
+
+    exit_report();
+    report.setLevel(3);  // the name is still known
+    EXPECT_EQ(report.getLevel(), 3);
+    exit_report();
+}
+
+TEST(QuorelReport, OpensByConstructorAndKeepsTheNameOfAnInvalidLevel) {
+    const test::TemporaryFolder folder;
+    const std::string name = folder.file("report.txt");
+    quorelReport report{name.c_str(), 7};
+    EXPECT_EQ(report.getLevel(), 0);
+    EXPECT_EQ(ckflg_ckerr(), 1);
+    report.setLevel(2);
+    EXPECT_EQ(report.getLevel(), 2);
+    EXPECT_THAT(test::read_text(name), testing::HasSubstr("QUOREL report (level 2) - - -"));
+    exit_report();
+}
+
+TEST(QuorelReport, WritesTheLogOnlyWhileTheReportIsOpen) {
+    const test::TemporaryFolder folder;
+    quorelReport report;
+    report.setLogName(folder.file("log.txt").c_str());
+    report.addLog("dropped");
+    report.setReportName(folder.file("report.txt").c_str());
+    report.addLog("%d lines", 12);
+    exit_report();
+    EXPECT_EQ(test::read_text(folder.file("log.txt")), "\n0) 12 lines\n");
+}
+
+struct Progress {
+    float percentage;
+    const char *text, *content;
+};
+constexpr Progress kProgress[] = {
+    {150.0F, "done", "100 \ndone"},
+    {99.99F, "100%s of %n", "99 \n100%s of %n"},
+    {0.0F, "", "0 \n"},
+    {-3.7F, "odd", "-3 \nodd"},
+    {NAN, "lost", "0 \nlost"},
+    {-INFINITY, "", "-2147483648 \n"},
+    {INFINITY, nullptr, "100 \n"},
+};
+
+TEST(QuorelReport, ProgressFileHoldsTheLatestStateOnly) {
+    const test::TemporaryFolder folder;
+    const std::string name = folder.file("progress.txt");
+    quorelReport report;
+    EXPECT_EQ(report.progress_update(5.0F, "nowhere"), 9);
+    EXPECT_EQ(errno, 0);
+    report.setProgressName(name.c_str());
+    for (const Progress& row : kProgress) {
+        EXPECT_EQ(report.progress_update(row.percentage, row.text), 0);
+        EXPECT_EQ(test::read_text(name), row.content);
+    }
+    report.setProgressName("/dev/full");
+    EXPECT_EQ(report.progress_update(5.0F, "full"), 5);
+    EXPECT_EQ(errno, 0);
+}
+
+}  // namespace
