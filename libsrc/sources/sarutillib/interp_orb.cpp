@@ -49,11 +49,11 @@ public:
             const long double next = (node(i) * current_[i] - below * before_[i]) / above;
             before_[i] = std::exchange(current_[i], next);
         }
-        for (std::size_t k = degree_ + 1; k-- > 0;) {
-            const long double lower = k > 0 ? current_series_[k - 1] : 0.0L;
-            before_series_[k] = (lower - below * before_series_[k]) / above;
+        long double lower = 0.0L;
+        for (std::size_t k = 0; k <= degree_; ++k) {
+            const long double next = (lower - below * before_series_[k]) / above;
+            lower = before_series_[k] = std::exchange(current_series_[k], next);
         }
-        std::swap(before_series_, current_series_);
         take_current();
     }
 
@@ -127,9 +127,17 @@ double misfit(const Stored& c, std::size_t degree, const Nodes& nodes, const dou
     return largest(nodes.count, [&](std::size_t i) { return POSMACRO(nodes.at(i), highest, terms) - values[i]; });
 }
 
+/** The polynomial of the highest degree. False where it misses the values by more than `rounding`. */
+bool fit_through(GramFit fit, const Nodes& nodes, const double* values, double rounding, Stored* kept) noexcept {
+    if (nodes.count > kMaxDegree + 1) return false;
+    while (fit.degree() + 1 < nodes.count) fit.advance();
+    *kept = expanded(fit, nodes);
+    return misfit(*kept, fit.degree(), nodes, values) <= rounding;
+}
+
 /** Fits rising degrees and keeps the highest whose misfit is next to the smallest seen. False where no
  * coefficients are finite. */
-bool fit_axis(GramFit fit, const Nodes& nodes, const double* values, double rounding, Stored* kept) noexcept {
+bool fit_near(GramFit fit, const Nodes& nodes, const double* values, double rounding, Stored* kept) noexcept {
     constexpr double kHopeless = 1e3;  // a misfit grown this much is the coefficients' rounding, and keeps growing
     double best = std::numeric_limits<double>::max();
     bool found = false;
@@ -188,9 +196,11 @@ extern "C" int orbffit(double t0, double dt, const double* values, int n, double
     if (!rows) return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
 
     const double most = largest(count, [values](std::size_t i) { return values[i]; });
+    const double rounding = 2.0 * std::numeric_limits<double>::epsilon() * most;
+    const Nodes nodes{t0, n > 1 ? dt : 0.0, count};
     Stored kept;
-    if (!std::isfinite(most) || !fit_axis({values, count, rows.data()}, {t0, n > 1 ? dt : 0.0, count}, values,
-                                          2.0 * std::numeric_limits<double>::epsilon() * most, &kept))
+    if (!std::isfinite(most) || (!fit_through({values, count, rows.data()}, nodes, values, rounding, &kept) &&
+                                 !fit_near({values, count, rows.data()}, nodes, values, rounding, &kept)))
         return frame.fail(QUO_NUMERIC, "No polynomial with finite coefficients fits the values");
 
     const std::size_t stored = std::min(count, kept.size());
