@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <charconv>
 #include <cmath>
+#include <cstdlib>
 #include <limits>
 
 #include "sarutillib/number_text_scale.h"
@@ -20,6 +21,44 @@ NumberText text_of(How... how) noexcept {
     const auto end = std::to_chars(text.data, text.data + kNumberRoom - 1, how...).ptr;
     *end = '\0';
     text.size = static_cast<std::size_t>(end - text.data);
+    return text;
+}
+
+/** Writes "e+05": a sign and at least two digits. */
+char* put_exponent(char* at, int exponent) noexcept {
+    *at++ = 'e';
+    *at++ = exponent < 0 ? '-' : '+';
+    const int magnitude = std::abs(exponent);
+    if (magnitude < 10) *at++ = '0';
+    return std::to_chars(at, at + 3, magnitude).ptr;
+}
+
+/** Writes digits and point of d.ddd * 10^exponent in printf's "%g" way: without final zeros, and with an exponent
+ * when the number is below 1e-4 or has more places than `precision`. */
+NumberText general_text(DecimalDigits number, int precision, bool negative) noexcept {
+    char digits[kNumberRoom];
+    auto count = std::to_chars(digits, digits + sizeof digits, number.digits).ptr - digits;
+    while (count > 1 && digits[count - 1] == '0') --count;
+
+    NumberText text;
+    char* at = text.data;
+    if (negative) *at++ = '-';
+    const auto put = [&](const char* from, std::ptrdiff_t length) { at = std::copy_n(from, length, at); };
+    const auto put_zeros = [&](std::ptrdiff_t length) { at = std::fill_n(at, length, '0'); };
+    const bool scientific = number.exponent < -4 || number.exponent >= precision;
+    const std::ptrdiff_t before_point = scientific ? 1 : std::max(number.exponent + 1, 0);
+
+    put(digits, std::min(before_point, count));
+    put_zeros(before_point - std::min(before_point, count));
+    if (before_point == 0) put_zeros(1);
+    if (count > before_point) {
+        *at++ = '.';
+        if (!scientific) put_zeros(-1 - number.exponent);
+        put(digits + before_point, count - before_point);
+    }
+    if (scientific) at = put_exponent(at, number.exponent);
+    *at = '\0';
+    text.size = static_cast<std::size_t>(at - text.data);
     return text;
 }
 
@@ -157,7 +196,10 @@ Scanned<double> scan_unsigned(const char* begin, const char* end) noexcept {
 }  // namespace
 
 NumberText format_general(double value, int precision) noexcept {
-    const int digits = precision < 0 ? kPrintfDefaultPrecision : std::min(precision, kMostDigits);
+    const int digits = precision < 0 ? kPrintfDefaultPrecision : std::clamp(precision, 1, kMostDigits);
+    if (digits <= kMostFirstDigits && std::isnormal(value))
+        if (const auto found = first_digits(std::fabs(value), digits))
+            return general_text(*found, digits, std::signbit(value));
     return text_of(value, std::chars_format::general, digits);
 }
 
