@@ -1,12 +1,12 @@
 #include "diagnosticslib/report.h"
 
-#include <cerrno>
 #include <climits>
 #include <cstdio>
 #include <cstring>
 #include <ctime>
 #include <optional>
 
+#include "diagnosticslib/errno_kept.h"
 #include "quo_base/ckerr.h"
 #include "sarutillib/bounded_text.h"
 
@@ -31,18 +31,6 @@ Channel report, log_file;
 // of the report's elapsed times and replaces the title of its closing banner.
 char shared_title[kTitleRoom];
 std::time_t shared_start;
-
-/** Writing diagnostics must not change what the caller finds in errno. */
-class ErrnoKept {
-public:
-    ErrnoKept() noexcept = default;
-    ~ErrnoKept() { errno = kept_; }
-    ErrnoKept(const ErrnoKept&) = delete;
-    ErrnoKept& operator=(const ErrnoKept&) = delete;
-
-private:
-    int kept_ = errno;
-};
 
 const char* shown(const char* text) noexcept {
     return text ? text : "(null)";
@@ -149,7 +137,7 @@ void quo::silence_report_and_log() noexcept {
 
 extern "C" int init_report(const char* file_name, const char* title, int level) noexcept {
     if (const auto answer = open_channel(report, file_name, title, level)) return *answer;
-    const ErrnoKept kept;
+    const quo::ErrnoKept kept;
     std::fprintf(report.stream, "\n%s\n QUOREL report (level %d) - %s - Started on %s%s\n", kRule, level,
                  shared_title, DateText{shared_start}.text, kRule);
     return std::fflush(report.stream);
@@ -161,6 +149,7 @@ extern "C" int init_log(const char* file_name, const char* title, int level) noe
 
 extern "C" int exit_report(void) noexcept {
     if (!report.is_open()) return one_below(report.level);
+    const quo::ErrnoKept kept;
     quo::silence_report_and_log();
     if (report.stream)
         std::fprintf(report.stream, "\n%s\n QUOREL report - %s - Ended on %s%s\n", kRule, shared_title,
@@ -181,7 +170,7 @@ extern "C" int set_flg_report(int level) noexcept {
 extern "C" void quo_add_report(const char* message, int kind, int line, const char* function,
                                const char* file) noexcept {
     if (!report.is_open()) return;
-    const ErrnoKept kept;
+    const quo::ErrnoKept kept;
     const Entry entry{shown(message), kind, line, shown(function), shown(file)};
     if (report.stream) write_entry(report.stream, report.entries, entry);  // none behind a level that was forced
     if (kind == QUO_ERROR || kind == QUO_MESSAGE) {
@@ -193,13 +182,13 @@ extern "C" void quo_add_report(const char* message, int kind, int line, const ch
 
 extern "C" int quo_add_log(const char* text) noexcept {
     if (!log_file.stream) return EOF;
-    const ErrnoKept kept;
+    const quo::ErrnoKept kept;
     std::fprintf(log_file.stream, "\n%d) %s\n", log_file.entries++, shown(text));
     return std::fflush(log_file.stream);
 }
 
 extern "C" void quo_check(int error_number, int line, const char* function, const char* file) noexcept {
     if (error_number == 0 || !report.is_open()) return;
-    const ErrnoKept kept;
+    const quo::ErrnoKept kept;
     quo_add_report(std::strerror(error_number), QUO_ERROR, line, function, file);
 }
