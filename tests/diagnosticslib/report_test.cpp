@@ -1,0 +1,419 @@
+#include <gmock/gmock.h>
+
+#include <cerrno>
+#include <climits>
+#include <cstdlib>
+#include <cstring>
+#include <ctime>
+#include <limits>
+#include <string>
+
+#include "quo_base/ckerr.h"
+#include "support/diagnostics.h"
+
+namespace {
+std::time_t now_s = 0;
+}
+
+// The reports of this program are dated by the tests themselves: this definition comes before the system's.
+extern "C" std::time_t time(std::time_t* result) noexcept {
+    if (result) *result = now_s;
+    return now_s;
+}
+
+namespace {
+
+using testing::ElementsAre;
+using testing::EndsWith;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::Not;
+using testing::StartsWith;
+
+const std::string kRule(78, '=');
+constexpr char kLaunchDate[] = "Thu Apr  3 21:02:26 2014\n";
+constexpr std::time_t kLaunch_s = 1396558946;
+
+class ReportFile : public testing::Test {
+protected:
+    ReportFile() {
+        setenv("TZ", "UTC0", 1);
+        tzset();
+        now_s = kLaunch_s;
+        set_flg_report(0);
+        exit_ckerr();
+        init_ckerr_locking();
+        errno = 0;
+    }
+    ~ReportFile() override {
+        if (ckflg_report() == 0) set_flg_report(1);  // a log may be open behind a closed report
+        const test::CapturedStderr quiet;
+        exit_report();
+        exit_ckerr();
+    }
+
+    /** The report's text without its opening banner. */
+    [[nodiscard]] std::string body() const {
+        const std::string text = test::read_text(name);
+        const auto end = text.rfind(kRule + "\n", text.find("Ended on") - kRule.size() - 3);
+        return end == text.npos ? text : text.substr(end + kRule.size() + 1);
+    }
+
+    test::TemporaryFolder folder;
+    const std::string name = folder.file("report.txt"), log_name = folder.file("log.txt");
+};
+
+std::string opening(int level, const std::string& title, const std::string& date = kLaunchDate) {
+    return "\n" + kRule + "\n QUOREL report (level " + std::to_string(level) + ") - " + title + " - Started on " +
+           date + kRule + "\n";
+}
+std::string closing(const std::string& title, const std::string& date) {
+    return "\n" + kRule + "\n QUOREL report - " + title + " - Ended on " + date + kRule + "\n";
+}
+
+// ---- Opening
+
+struct Opening {
+    const char* label;
+    bool tracking;
+    int level, result;
+    bool opens;
+};
+class ReportOpening : public ReportFile, public testing::WithParamInterface<Opening> {};
+
+TEST_P(ReportOpening, AnswersAndOpensAsItsLevelSays) {
+    const Opening& row = GetParam();
+    if (!row.tracking) exit_ckerr();
+    EXPECT_EQ(init_report(name.c_str(), "scene 17", row.level), row.result);
+    EXPECT_EQ(ckflg_report(), row.opens ? row.level : 0);
+    EXPECT_EQ(test::read_text(name), row.opens ? opening(row.level, "scene 17") : "");
+    EXPECT_EQ(std::filesystem::exists(name), row.opens);
+}
+INSTANTIATE_TEST_SUITE_P(Levels, ReportOpening,
+                         testing::Values(Opening{"One", true, 1, 0, true}, Opening{"Two", true, 2, 0, true},
+                                         Opening{"Three", true, 3, 0, true}, Opening{"Zero", true, 0, -1, false},
+                                         Opening{"Four", true, 4, 3, false},
+                                         Opening{"Negative", true, -7, -8, false},
+                                         Opening{"Lowest", true, INT_MIN, INT_MIN, false},
+                                         Opening{"Highest", true, INT_MAX, INT_MAX - 1, false},
+                                         Opening{"Untracked", false, 1, 0, false},
+                                         Opening{"UntrackedAndInvalid", false, 4, 0, false}),
+                         [](const auto& row) { return row.param.label; });
+
+TEST_F(ReportFile, StaysAsItIsWhenOpenedAgain) {
+    init_report(name.c_str(), "first", 2);
+    quo_add_report("kept", QUO_WARNING, 1, "f", "s");
+    const std::string before = test::read_text(name);
+    EXPECT_EQ(init_report(folder.file("other.txt").c_str(), "second", 3), 2);
+    EXPECT_EQ(init_report(name.c_str(), "second", 7), 2);
+    exit_ckerr();  // an open report answers before the tracking flag is looked at
+    EXPECT_EQ(init_report(name.c_str(), "second", 1), 2);
+    EXPECT_EQ(test::read_text(name), before);
+    EXPECT_FALSE(std::filesystem::exists(folder.file("other.txt")));
+}
+
+TEST_F(ReportFile, ReplacesWhatStoodInTheFile) {
+    test::write_text(name, "an older and much longer report" + std::string(5000, '.'));
+    EXPECT_EQ(init_report(name.c_str(), "t", 1), 0);
+    EXPECT_EQ(test::read_text(name), opening(1, "t"));
+}
+
+TEST_F(ReportFile, CannotBeOpenedWhereNoFileCanBe) {
+    for (const std::string& bad : {folder.file("missing/report.txt"), folder.path().string(), std::string{}}) {
+        EXPECT_EQ(init_report(bad.c_str(), "t", 1), 0) << bad;
+        EXPECT_EQ(ckflg_report(), 0) << bad;
+        EXPECT_EQ(init_log(bad.c_str(), "t", 1), 0) << bad;
+        quo_add_report("dropped", QUO_ERROR, 1, "f", "s");
+    }
+    EXPECT_EQ(init_report(nullptr, "t", 1), 0);
+    EXPECT_EQ(init_log(nullptr, nullptr, 1), 0);
+    EXPECT_EQ(exit_report(), -1);
+}
+
+TEST_F(ReportFile, FailedOpeningKeepsTheTitleOfTheOpenReport) {
+    init_report(name.c_str(), "kept", 1);
+    EXPECT_EQ(init_log(folder.file("missing/log.txt").c_str(), "lost", 1), 0);
+    exit_report();
+    EXPECT_THAT(test::read_text(name), HasSubstr(" QUOREL report - kept - Ended on "));
+}
+
+TEST_F(ReportFile, BoundsALongTitleTheSameWayInBothBanners) {
+    const std::string title(20000, 'x');
+    init_report(name.c_str(), title.c_str(), 1);
+    exit_report();
+    const std::string text = test::read_text(name), kept(4095, 'x');
+    EXPECT_EQ(text, opening(1, kept) + closing(kept, kLaunchDate));
+}
+
+// ---- Entries
+
+struct Kind {
+    int code;
+    const char* name;
+};
+constexpr Kind kShortKinds[] = {{1, "WARNING"},
+                                {2, "CHECKPOINT"},
+                                {4, "CORRECT_FUNCTION_CALL"},
+                                {5, "CORRECT_SYSTEM_CALL"},
+                                {6, "MESSAGE"},
+                                {22, "EXCEPTION"},
+                                {7, "UNKNOWN"},
+                                {15, "UNKNOWN"},
+                                {21, "UNKNOWN"},
+                                {23, "UNKNOWN"},
+                                {-1, "UNKNOWN"},
+                                {INT_MIN, "UNKNOWN"}};
+
+TEST_F(ReportFile, WritesEveryShortKindInTwoLines) {
+    init_report(name.c_str(), "t", 3);
+    std::string expected;
+    test::CapturedStderr echo;
+    for (const Kind& kind : kShortKinds) {
+        now_s += 13;
+        const auto number = (now_s - kLaunch_s) / 13 - 1;
+        quo_add_report("half 50% done", kind.code, 217, "DataFile::seek", "datafile.cpp");
+        expected += "\n" + std::to_string(number) + ")  " + kind.name + " [" + std::to_string(now_s - kLaunch_s) +
+                    " sec]: half 50% done\n    . FILE datafile.cpp, FUNCTION DataFile::seek, LINE 217.\n";
+    }
+    EXPECT_EQ(echo.text(), "MSG_MESSAGE: half 50% done.\n");
+    EXPECT_EQ(body(), expected);
+}
+
+TEST_F(ReportFile, NumbersErrorsAndCallTreeLines) {
+    init_report(name.c_str(), "Zürich 17", 1);
+    test::CapturedStderr echo;
+    now_s += 12;
+    quo_add_report("File not opened!", QUO_ERROR, 88, "DataFile::open", "datafile.cpp");
+    quo_add_report("not shown", QUO_ERROR_CALL_TREE, 41, "GSread", "generalSAR.cpp");
+    now_s += 3600;
+    quo_add_report("", QUO_ERROR, -1, "", "");
+    now_s += 5;
+    EXPECT_EQ(exit_report(), 0);
+
+    EXPECT_EQ(echo.text(), "MSG_ERROR: File not opened!.\nMSG_ERROR: .\n");
+    EXPECT_EQ(test::read_text(name), opening(1, "Zürich 17") +
+                                         "\n0)  ERROR [12 sec].\n"
+                                         "    FILE : datafile.cpp.\n"
+                                         "    FUNCTION : DataFile::open.\n"
+                                         "    LINE : 88.\n"
+                                         "    MESSAGE : File not opened!.\n"
+                                         "    . Call tree: FILE generalSAR.cpp, FUNCTION GSread, LINE 41.\n"
+                                         "\n2)  ERROR [3612 sec].\n"
+                                         "    FILE : .\n"
+                                         "    FUNCTION : .\n"
+                                         "    LINE : -1.\n"
+                                         "    MESSAGE : .\n" +
+                                         closing("Zürich 17", "Thu Apr  3 22:02:43 2014\n"));
+}
+
+TEST_F(ReportFile, NumbersFromZeroAgainAfterItWasClosed) {
+    init_report(name.c_str(), "t", 1);
+    quo_add_report("a", QUO_WARNING, 1, "f", "s");
+    quo_add_report("b", QUO_WARNING, 1, "f", "s");
+    exit_report();
+    init_report(name.c_str(), "t", 1);
+    quo_add_report("c", QUO_WARNING, 1, "f", "s");
+    EXPECT_THAT(body(), StartsWith("\n0)  WARNING [0 sec]: c\n"));
+}
+
+TEST_F(ReportFile, KeepsALongMessageWhole) {
+    init_report(name.c_str(), "t", 1);
+    const std::string message(300000, 'm');
+    quo_add_report(message.c_str(), QUO_WARNING, 1, "f", "s");
+    EXPECT_EQ(body(), "\n0)  WARNING [0 sec]: " + message + "\n    . FILE s, FUNCTION f, LINE 1.\n");
+}
+
+TEST_F(ReportFile, ShowsNullTexts) {
+    init_report(name.c_str(), nullptr, 1);
+    test::CapturedStderr echo;
+    for (const int kind : {0, 3, 6, 99}) quo_add_report(nullptr, kind, 1, nullptr, nullptr);
+    quo_check(EACCES, 2, nullptr, nullptr);
+    init_log(log_name.c_str(), nullptr, 1);
+    quo_add_log(nullptr);
+    EXPECT_EQ(exit_report(), 0);
+    EXPECT_EQ(test::read_text(log_name), "\n0) (null)\n");
+    EXPECT_THAT(test::read_text(name), HasSubstr(" QUOREL report - (null) - Ended on "));
+    EXPECT_THAT(test::read_text(name), HasSubstr("    . Call tree: FILE (null), FUNCTION (null), LINE 1.\n"));
+}
+
+// Entries must survive a crash, so each stands in the file before the call returns. A second stream sees only
+// that.
+TEST_F(ReportFile, FlushesEveryEntryAtOnce) {
+    init_report(name.c_str(), "t", 1);
+    init_log(log_name.c_str(), "t", 1);
+    const test::CapturedStderr quiet;
+    for (const int kind : {0, 1, 3, 6, 22}) {
+        const auto before = std::filesystem::file_size(name);
+        quo_add_report("m", kind, 1, "f", "s");
+        EXPECT_GT(std::filesystem::file_size(name), before) << kind;
+    }
+    quo_add_log("x");
+    EXPECT_EQ(test::read_text(log_name), "\n0) x\n");
+}
+
+// ---- Levels
+
+TEST_F(ReportFile, DropsEntriesWhileClosed) {
+    test::CapturedStderr echo;
+    quo_add_report("m", QUO_ERROR, 1, "f", "s");
+    quo_check(EIO, 1, "f", "s");
+    EXPECT_EQ(exit_report(), -1);
+    EXPECT_EQ(echo.text(), "");
+    init_report(name.c_str(), "t", 1);
+    EXPECT_EQ(test::read_text(name), opening(1, "t"));
+}
+
+TEST_F(ReportFile, IsSilencedAndResumedByItsLevel) {
+    init_report(name.c_str(), "t", 2);
+    quo_add_report("a", QUO_WARNING, 1, "f", "s");
+    for (const int silent : {0, 4, -1, INT_MAX}) {
+        EXPECT_EQ(set_flg_report(silent), silent);
+        EXPECT_EQ(ckflg_report(), silent);
+        quo_add_report("dropped", QUO_ERROR, 1, "f", "s");
+        EXPECT_EQ(exit_report(), silent - 1);
+    }
+    set_flg_report(3);
+    quo_add_report("b", QUO_WARNING, 1, "f", "s");
+    EXPECT_EQ(exit_report(), 0);
+    EXPECT_THAT(test::read_text(name), HasSubstr("\n1)  WARNING [0 sec]: b\n"));
+    EXPECT_THAT(test::read_text(name), Not(HasSubstr("dropped")));
+}
+
+TEST_F(ReportFile, OpensAnotherFileBehindALevelForcedToZero) {
+    init_report(name.c_str(), "t", 1);
+    quo_add_report("a", QUO_WARNING, 1, "f", "s");
+    set_flg_report(0);
+    const std::string other = folder.file("other.txt");
+    EXPECT_EQ(init_report(other.c_str(), "u", 2), 0);
+    quo_add_report("b", QUO_WARNING, 1, "f", "s");
+    EXPECT_EQ(exit_report(), 0);
+    EXPECT_THAT(body(), Not(HasSubstr("b")));
+    EXPECT_THAT(test::read_text(other), HasSubstr("\n0)  WARNING [0 sec]: b\n"));
+}
+
+TEST_F(ReportFile, SurvivesALevelThatWasForcedOpen) {
+    set_flg_report(2);
+    test::CapturedStderr echo;
+    quo_add_report("m", QUO_ERROR, 1, "f", "s");
+    EXPECT_NE(exit_report(), 0);
+    EXPECT_EQ(ckflg_report(), 0);
+    EXPECT_EQ(echo.text(), "MSG_ERROR: m.\n");
+}
+
+TEST_F(ReportFile, IsSilencedButNotClosedWhenTrackingStartsAnew) {
+    init_report(name.c_str(), "t", 1);
+    exit_ckerr();
+    EXPECT_EQ(ckflg_report(), 1);
+    quo_add_report("still written", QUO_WARNING, 1, "f", "s");
+    init_ckerr_locking();
+    EXPECT_EQ(ckflg_report(), 0);
+    EXPECT_EQ(body(), "\n0)  WARNING [0 sec]: still written\n    . FILE s, FUNCTION f, LINE 1.\n");
+}
+
+// ---- System errors
+
+TEST_F(ReportFile, ReportsSystemErrorsByTheirText) {
+    init_report(name.c_str(), "t", 1);
+    test::CapturedStderr echo;
+    quo_check(0, 1, "f", "s");
+    quo_check(2, 52, "open_header()", "header.cpp");
+    quo_check(987654, 53, "open_header()", "header.cpp");
+    EXPECT_EQ(body().substr(0, body().find("\n1)")),
+              "\n0)  ERROR [0 sec].\n    FILE : header.cpp.\n    FUNCTION : open_header().\n    LINE : 52.\n"
+              "    MESSAGE : No such file or directory.\n");
+    EXPECT_THAT(body(), HasSubstr("\n1)  ERROR [0 sec].\n"));
+    EXPECT_THAT(echo.text(), StartsWith("MSG_ERROR: No such file or directory.\nMSG_ERROR: "));
+}
+
+TEST_F(ReportFile, LeavesErrnoAlone) {
+    const test::CapturedStderr quiet;
+    const auto keeps = [](auto call) {
+        errno = EXDEV;
+        call();
+        return errno == EXDEV;
+    };
+    for (const char* file : {name.c_str(), "/dev/full"}) {
+        SCOPED_TRACE(file);
+        EXPECT_TRUE(keeps([&] { init_report(file, "t", 1); }));
+        EXPECT_TRUE(keeps([&] { init_log(file, "t", 1); }));
+        EXPECT_TRUE(keeps([] { quo_add_report("m", QUO_ERROR, 1, "f", "s"); }));
+        EXPECT_TRUE(keeps([] { quo_add_report("m", QUO_ERROR_CALL_TREE, 1, "f", "s"); }));
+        EXPECT_TRUE(keeps([] { quo_add_report("m", QUO_MESSAGE, 1, "f", "s"); }));
+        EXPECT_TRUE(keeps([] { quo_check(ENOENT, 1, "f", "s"); }));
+        EXPECT_TRUE(keeps([] { quo_add_log("x"); }));
+        EXPECT_TRUE(keeps([] { exit_report(); }));
+    }
+}
+
+// ---- Log
+
+TEST_F(ReportFile, LogTakesNumberedLines) {
+    EXPECT_EQ(init_log(log_name.c_str(), "t", 3), 1);
+    EXPECT_EQ(init_log(log_name.c_str(), "t", 1), 3);
+    EXPECT_EQ(test::read_text(log_name), "");
+    EXPECT_EQ(quo_add_log("burst 1 of 9"), 0);
+    EXPECT_EQ(quo_add_log("100% of %s"), 0);
+    EXPECT_EQ(test::read_text(log_name), "\n0) burst 1 of 9\n\n1) 100% of %s\n");
+}
+
+TEST_F(ReportFile, LogRefusesWhatTheReportRefuses) {
+    EXPECT_EQ(init_log(log_name.c_str(), "t", 0), -1);
+    EXPECT_EQ(init_log(log_name.c_str(), "t", 4), 3);
+    exit_ckerr();
+    EXPECT_EQ(init_log(log_name.c_str(), "t", 1), 0);
+    EXPECT_FALSE(std::filesystem::exists(log_name));
+    EXPECT_NE(quo_add_log("nowhere"), 0);
+}
+
+TEST_F(ReportFile, LogOpenedLaterTakesOverTitleAndStartTime) {
+    init_report(name.c_str(), "report", 1);
+    now_s += 100;
+    init_log(log_name.c_str(), "log", 1);
+    now_s += 7;
+    quo_add_report("m", QUO_WARNING, 1, "f", "s");
+    exit_report();
+    EXPECT_EQ(test::read_text(name), opening(1, "report") +
+                                         "\n0)  WARNING [7 sec]: m\n    . FILE s, FUNCTION f, LINE 1.\n" +
+                                         closing("log", "Thu Apr  3 21:04:13 2014\n"));
+}
+
+TEST_F(ReportFile, ClosingTakesTheLogAlong) {
+    init_report(name.c_str(), "t", 1);
+    init_log(log_name.c_str(), "t", 2);
+    EXPECT_EQ(exit_report(), 0);
+    EXPECT_NE(quo_add_log("too late"), 0);
+    EXPECT_EQ(init_log(log_name.c_str(), "t", 1), 1) << "the log's level was not set back";
+    // With no report open there is no way to close a log: deliberate.
+    EXPECT_EQ(exit_report(), -1);
+    EXPECT_EQ(quo_add_log("still open"), 0);
+    EXPECT_EQ(test::read_text(log_name), "\n0) still open\n");
+}
+
+// ---- Full disk
+
+TEST_F(ReportFile, OnAFullDiskGivesANonZeroResult) {
+    EXPECT_NE(init_report("/dev/full", "t", 1), 0);
+    EXPECT_EQ(ckflg_report(), 1);
+    quo_add_report("lost", QUO_WARNING, 1, "f", "s");
+    EXPECT_NE(exit_report(), 0);
+    EXPECT_EQ(ckflg_report(), 0);
+}
+
+TEST_F(ReportFile, LogOnAFullDiskGivesANonZeroResult) {
+    init_report(name.c_str(), "t", 1);
+    EXPECT_EQ(init_log("/dev/full", "t", 1), 1);
+    EXPECT_NE(quo_add_log("lost"), 0);
+    EXPECT_NE(exit_report(), 0);
+    EXPECT_THAT(test::read_text(name), EndsWith(closing("t", kLaunchDate)));
+}
+
+// The result once came from the log alone: a report lost to a full disk was closed with 0 when a log was open.
+TEST_F(ReportFile, LostReportShowsBehindAGoodLog) {
+    init_report("/dev/full", "t", 1);
+    init_log(log_name.c_str(), "t", 1);
+    quo_add_log("kept");
+    EXPECT_NE(exit_report(), 0);
+    EXPECT_EQ(test::read_text(log_name), "\n0) kept\n");
+}
+
+}  // namespace

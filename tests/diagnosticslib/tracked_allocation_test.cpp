@@ -1,0 +1,478 @@
+#include <gmock/gmock.h>
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <cstdint>
+#include <cstring>
+#include <limits>
+#include <random>
+#include <string>
+#include <vector>
+
+#include "quo_base/ckerr.h"
+#include "support/diagnostics.h"
+
+// Requests beyond all memory are refused with null under the address sanitizer too, as by the system.
+// NOLINTNEXTLINE(bugprone-reserved-identifier): the sanitizer looks for this name
+extern "C" [[gnu::visibility("default")]] const char* __asan_default_options() {
+    return "allocator_may_return_null=1";
+}
+
+namespace {
+
+using testing::HasSubstr;
+using testing::StartsWith;
+
+constexpr int kCapacity = 16384;
+/** More than any address space gives, without overflowing. Volatile: compilers warn of such a request. */
+volatile std::size_t beyond_memory = std::size_t{1} << 62;
+volatile std::size_t overflowing = SIZE_MAX;
+
+std::string leak_report() {
+    test::CapturedStderr captured;
+    exit_ckerr();
+    return captured.text();
+}
+
+class Tracked : public testing::Test {
+protected:
+    Tracked() {
+        exit_ckerr();
+        init_ckerr_locking();
+        errno = 0;
+    }
+    ~Tracked() override {
+        EXPECT_EQ(leak_report(), "");
+        errno = 0;
+    }
+};
+
+// ---- Blocks
+
+TEST_F(Tracked, BlocksAreAlignedAndLeadBackToTheSystemsAddress) {
+    for (const bool tracking : {true, false}) {
+        if (!tracking) exit_ckerr();
+        for (std::size_t size = 0; size < 200; ++size) {
+            void* block = size % 2 ? malloc_ckerr(size) : calloc_ckerr(1, size);
+            ASSERT_NE(block, nullptr);
+            const auto address = reinterpret_cast<std::uintptr_t>(block);
+            EXPECT_EQ(address % 16, 0U);
+            std::uintptr_t system = 0;
+            std::memcpy(&system, static_cast<char*>(block) - sizeof system, sizeof system);
+            EXPECT_EQ(address, (system + 16) / 16 * 16);
+            std::memset(block, 0xA5, size);  // every byte is there
+            free_ckerr(block);
+        }
+    }
+}
+
+TEST_F(Tracked, CallocClearsWhatWasUsedBefore) {
+    for (const std::size_t size : {17U, 1000U, 300000U, 9000000U}) {
+        void* used = malloc_ckerr(size);
+        std::memset(used, 0xA5, size);
+        free_ckerr(used);
+        auto* block = static_cast<unsigned char*>(calloc_ckerr(size, 1));
+        EXPECT_TRUE(std::all_of(block, block + size, [](unsigned char byte) { return byte == 0; })) << size;
+        free_ckerr(block);
+    }
+}
+
+TEST_F(Tracked, SizesThatCannotBeHadGiveNull) {
+    struct Request {
+        std::size_t count, size;
+    };
+    const Request requests[] = {{overflowing, 1},
+                                {overflowing - 14, 1},
+                                {1, overflowing},
+                                {overflowing, overflowing},
+                                {std::size_t{1} << 32, std::size_t{1} << 32},
+                                {beyond_memory, 1},
+                                {1, beyond_memory}};
+    for (const bool tracking : {true, false}) {
+        if (!tracking) exit_ckerr();
+        for (const auto& [count, size] : requests) {
+            errno = 0;
+            EXPECT_EQ(calloc_ckerr(count, size), nullptr) << count << " x " << size;
+            EXPECT_EQ(errno, ENOMEM);
+        }
+        for (const std::size_t size : {std::size_t{overflowing}, overflowing - 15, std::size_t{beyond_memory}}) {
+            errno = 0;
+            EXPECT_EQ(malloc_ckerr(size), nullptr) << size;
+            EXPECT_EQ(errno, ENOMEM);
+        }
+        freeall_ckerr();  // the null entries
+    }
+}
+
+// ---- Ownership
+
+TEST_F(Tracked, FreeallTakesTheBlocksOfTheCallAndItsCallees) {
+    void* before = malloc_ckerr(11);
+    set_ckerr_fun("f");
+    ASSERT_NE(malloc_ckerr(12), nullptr);
+    ASSERT_NE(calloc_ckerr(13, 1), nullptr);
+    set_ckerr_fun("g");
+    ASSERT_NE(malloc_ckerr(14), nullptr);
+    deccurdep();
+    freeall_ckerr();
+    deccurdep();
+    std::memset(before, 1, 11);
+    free_ckerr(before);
+}
+
+TEST_F(Tracked, FreeallLeavesTheBlocksOfEarlierCalls) {
+    void* kept[3];
+    set_ckerr_fun("f");
+    kept[0] = malloc_ckerr(1);
+    set_ckerr_fun("g");
+    kept[1] = malloc_ckerr(2);
+    deccurdep();
+    set_ckerr_fun("g");
+    ASSERT_NE(malloc_ckerr(3), nullptr);
+    freeall_ckerr();
+    deccurdep();
+    deccurdep();
+    set_ckerr_fun("f");
+    kept[2] = malloc_ckerr(4);
+    set_ckerr_fun("g");
+    freeall_ckerr();
+    deccurdep();
+    for (void* block : kept) {
+        std::memset(block, 1, 1);
+        free_ckerr(block);
+    }
+    deccurdep();
+}
+
+TEST_F(Tracked, FreeallInMainTakesEverything) {
+    for (int depth = 0; depth < 5; ++depth) {
+        ASSERT_NE(malloc_ckerr(7), nullptr);
+        ASSERT_EQ(malloc_ckerr(overflowing), nullptr);
+        set_ckerr_fun("f");
+    }
+    for (int depth = 0; depth < 5; ++depth) deccurdep();
+    freeall_ckerr();
+}
+
+// The counters have 16 bits: after 65536 calls the coordinates of a callee equal those that its caller's blocks
+// carry, and a comparison of counters would free the caller's blocks under it.
+TEST_F(Tracked, CallersBlocksSurviveTheWrapAroundOfTheCounters) {
+    set_ckerr_fun("caller");
+    auto* block = static_cast<char*>(malloc_ckerr(100));
+    for (int i = 0; i < 65536; ++i) {
+        set_ckerr_fun("callee");
+        freeall_ckerr();
+        deccurdep();
+    }
+    std::memset(block, 1, 100);
+    free_ckerr(block);
+    deccurdep();
+}
+
+TEST_F(Tracked, UnknownBlocksAreNeitherFreedNorReported) {
+    exit_ckerr();
+    auto* untracked = static_cast<char*>(malloc_ckerr(64));
+    init_ckerr_locking();
+    int local = 0;
+    test::CapturedStderr captured;
+    free_ckerr(untracked);
+    free_ckerr(&local);
+    freeall_ckerr();
+    EXPECT_EQ(captured.text(), "");
+    std::memset(untracked, 1, 64);  // still there
+    exit_ckerr();
+    free_ckerr(untracked);
+}
+
+TEST_F(Tracked, NullTakesTheFirstNullEntryOut) {
+    free_ckerr(nullptr);
+    for (const char* name : {"a", "b", "c"}) {
+        set_ckerr_fun(name);
+        ASSERT_EQ(malloc_ckerr(overflowing), nullptr);
+        deccurdep();
+    }
+    free_ckerr(nullptr);  // of a; c moves to its place
+    EXPECT_THAT(leak_report(), HasSubstr("coordinates: \nc : 0\t3\t\nb : 0\t2\t\n"));
+    free_ckerr(nullptr);  // without tracking: nothing
+}
+
+// ---- Leak report
+
+TEST_F(Tracked, LeakReportListsTheTableInItsOrder) {
+    std::vector<void*> blocks;
+    const auto allocate = [&](const char* name) {
+        set_ckerr_fun(name);
+        blocks.push_back(malloc_ckerr(1));
+        deccurdep();
+    };
+    for (const char* name : {"first()", "second()", "third()", "fourth()"}) allocate(name);
+    set_ckerr_fun("outer()");
+    allocate("GeneralSAROrbit::SVGetPos");
+    free_ckerr(blocks[1]);  // the last entry moves to its place
+    const std::string text = leak_report();
+    EXPECT_EQ(text,
+              "\nPotential memory leaks detected!\n"
+              "\n4 buffers left to be de-allocated.!\n"
+              "--------------------------------\n"
+              "ML call graph coordinates: \n"
+              "first() : 0\t1\t\n"
+              "GeneralSAROrbit::SVGetPos : 0\t5\t1\t\n"
+              "third() : 0\t3\t\n"
+              "fourth() : 0\t4\t\n");
+    EXPECT_EQ(ckflg_ckerr(), 0);
+    EXPECT_EQ(leak_report(), "") << "a second exit has nothing to say";
+    // The leaked blocks were not freed.
+    blocks.erase(blocks.begin() + 1);
+    for (void* block : blocks) free_ckerr(block);
+}
+
+TEST_F(Tracked, LeakReportCountsTo65535) {
+    for (int i = 0; i < 40000; ++i) {
+        set_ckerr_fun("f");
+        deccurdep();
+    }
+    void* block = nullptr;
+    set_ckerr_fun("f");
+    block = malloc_ckerr(1);
+    EXPECT_THAT(leak_report(), HasSubstr("\nf : 0\t40001\t\n"));
+    free_ckerr(block);
+}
+
+// ---- Matrices
+
+TEST_F(Tracked, MatrixRowsAreZeroFilledAndGoTogether) {
+    for (const bool tracking : {true, false}) {
+        if (!tracking) exit_ckerr();
+        auto** rows = static_cast<void**>(matalloc_ckerr(17, 33));
+        ASSERT_NE(rows, nullptr);
+        for (int row = 0; row < 17; ++row) {
+            auto* bytes = static_cast<char*>(rows[row]);
+            EXPECT_TRUE(std::all_of(bytes, bytes + 33, [](char byte) { return byte == 0; }));
+            std::memset(bytes, row + 1, 33);
+        }
+        matfree_ckerr(rows, 17);
+    }
+}
+
+TEST_F(Tracked, MatrixWithoutRowsIsAnEmptyArray) {
+    for (const int rows : {0, -1, INT_MIN}) {
+        void* array = matalloc_ckerr(rows, 10);
+        EXPECT_NE(array, nullptr);
+        matfree_ckerr(static_cast<void**>(array), rows);
+    }
+    matfree_ckerr(nullptr, 5);
+}
+
+TEST_F(Tracked, MatrixThatFailsLeavesItsPartsToFreeall) {
+    test::AllocationLimit limit{5};
+    set_ckerr_fun("f");
+    EXPECT_EQ(matalloc_ckerr(3, overflowing), nullptr);
+    EXPECT_EQ(limit.room(), 3) << "the array and a null row";
+    freeall_ckerr();
+    EXPECT_EQ(matalloc_ckerr(6, 8), nullptr);
+    EXPECT_EQ(limit.room(), 0) << "the array and four rows";
+    freeall_ckerr();
+    EXPECT_EQ(limit.room(), 5);
+    deccurdep();
+}
+
+// Nothing can reclaim the parts then: they are freed at once, which the leak sanitizer confirms.
+TEST_F(Tracked, MatrixThatFailsWithoutTrackingLeavesNothing) {
+    exit_ckerr();
+    EXPECT_EQ(matalloc_ckerr(3, overflowing), nullptr);
+}
+
+// ---- Capacity
+
+TEST_F(Tracked, FullTableFailsTheAllocationWithAnErrorEntry) {
+    test::Report report;
+    test::AllocationLimit limit{kCapacity};
+    EXPECT_EQ(limit.room(), kCapacity);
+    const test::AllocationLimit none{0};
+    const test::CapturedStderr quiet;
+    EXPECT_EQ(malloc_ckerr(8), nullptr);
+    EXPECT_EQ(calloc_ckerr(8, 8), nullptr);
+    EXPECT_EQ(malloc_ckerr(overflowing), nullptr);
+    EXPECT_EQ(report.entries("ERROR").size(), 3U);
+    EXPECT_EQ(report.entries("ERROR")[1].function, "calloc_ckerr");
+}
+
+TEST_F(Tracked, FullTableIsNoLimitWithoutTracking) {
+    exit_ckerr();
+    std::vector<void*> blocks;
+    for (int i = 0; i < kCapacity + 10; ++i) blocks.push_back(malloc_ckerr(1));
+    EXPECT_EQ(std::count(blocks.begin(), blocks.end(), nullptr), 0);
+    for (void* block : blocks) free_ckerr(block);
+}
+
+// ---- Against a plain model
+
+/** The table as it is described: a list that is searched from the front, with all counters in every entry. */
+class PlainTable {
+public:
+    void enter(std::string name) {
+        ++depth_;
+        ++counters_[slot()];
+        names_[slot()] = std::move(name);
+    }
+    void leave() { depth_ -= depth_ > 0; }
+    void add(void* block) { entries_.push_back({block, slot(), counters_, names_[slot()]}); }
+    bool remove(void* block) {
+        const auto found = std::find_if(entries_.begin(), entries_.end(),
+                                        [block](const Entry& entry) { return entry.block == block; });
+        if (found == entries_.end()) return false;
+        *found = entries_.back();
+        entries_.pop_back();
+        return true;
+    }
+    void remove_own() {
+        for (bool again = true; again;) {
+            const auto found =
+                std::find_if(entries_.begin(), entries_.end(), [this](const Entry& entry) { return owns(entry); });
+            again = found != entries_.end() && remove(found->block);
+        }
+    }
+    [[nodiscard]] std::string leak_lines() const {
+        std::string text;
+        for (const Entry& entry : entries_) {
+            text += entry.name + " : ";
+            for (std::size_t depth = 0; depth <= entry.depth; ++depth)
+                text += std::to_string(entry.counters[depth]) + "\t";
+            text += "\n";
+        }
+        return text;
+    }
+    [[nodiscard]] std::vector<void*> blocks() const {
+        std::vector<void*> all;
+        for (const Entry& entry : entries_) all.push_back(entry.block);
+        return all;
+    }
+    [[nodiscard]] std::size_t depth() const { return depth_; }
+
+private:
+    using Counters = std::array<std::uint16_t, 64>;
+    struct Entry {
+        void* block;
+        std::size_t depth;
+        Counters counters;
+        std::string name;
+    };
+    [[nodiscard]] std::size_t slot() const { return std::min<std::size_t>(depth_, 63); }
+    [[nodiscard]] bool owns(const Entry& entry) const {
+        for (std::size_t depth = slot(); depth >= 1; --depth)
+            if (entry.counters[depth] != counters_[depth]) return false;
+        return true;
+    }
+
+    std::size_t depth_ = 0;
+    Counters counters_{};
+    std::array<std::string, 64> names_{"main()"};
+    std::vector<Entry> entries_;
+};
+
+/** Weights of the random steps, and how deep the calls go. */
+struct Mix {
+    const char* name;
+    int rounds, steps, deepest;
+    std::array<double, 8>
+        weights;  // enter, leave, allocate, fail, free a live one, free null, free an unknown, freeall
+};
+
+class AgainstPlainTable : public testing::TestWithParam<Mix> {
+protected:
+    void step(int kind) {
+        switch (kind) {
+            case 0:
+                return enter();
+            case 1:
+                return leave();
+            case 2:
+                return add(malloc_ckerr(random(40)));
+            case 3:
+                return add(malloc_ckerr(overflowing));
+            case 4:
+                return remove(any_live());
+            case 5:
+                return remove(nullptr);
+            case 6:
+                return remove(&unknown_[random(16)]);
+            default:
+                plain.remove_own();
+                freeall_ckerr();
+        }
+    }
+    std::size_t random(std::size_t below) {
+        return std::uniform_int_distribution<std::size_t>{0, below - 1}(engine);
+    }
+
+    std::mt19937 engine{20140403};
+    PlainTable plain;
+
+private:
+    void enter() {
+        if (plain.depth() >= static_cast<std::size_t>(GetParam().deepest)) return;
+        const std::string name = "f" + std::to_string(calls_++);
+        plain.enter(name);
+        set_ckerr_fun(name.c_str());
+    }
+    void leave() {
+        plain.leave();
+        deccurdep();
+    }
+    void add(void* block) { plain.add(block); }
+    void remove(void* block) {
+        plain.remove(block);
+        free_ckerr(block);
+    }
+    void* any_live() {
+        const auto blocks = plain.blocks();
+        return blocks.empty() ? nullptr : blocks[random(blocks.size())];
+    }
+
+    int calls_ = 0;
+    char unknown_[16] = {};
+};
+
+// Names differ from call to call, so the leak report shows the order of the table; blocks that the plain table
+// holds and the other has freed, or the reverse, show under the sanitizers.
+TEST_P(AgainstPlainTable, GivesTheSameTable) {
+    const Mix& mix = GetParam();
+    std::discrete_distribution<int> kinds{mix.weights.begin(), mix.weights.end()};
+    for (int round = 0; round < mix.rounds; ++round) {
+        plain = PlainTable{};
+        exit_ckerr();
+        init_ckerr_locking();
+        for (int i = 0; i < mix.steps; ++i) step(kinds(engine));
+        errno = 0;
+        const std::string expected = plain.leak_lines(), text = leak_report();
+        const auto heading = text.find("coordinates: \n");
+        ASSERT_EQ(heading == text.npos ? "" : text.substr(heading + 14), expected) << "round " << round;
+        for (void* block : plain.blocks()) free_ckerr(block);  // tracking is off
+    }
+}
+INSTANTIATE_TEST_SUITE_P(Mixes, AgainstPlainTable,
+                         testing::Values(Mix{"Everything", 300, 200, 6, {20, 18, 40, 5, 20, 3, 2, 2}},
+                                         Mix{"MostlyNull", 300, 120, 5, {20, 17, 10, 30, 8, 3, 1, 4}},
+                                         Mix{"BeyondTheLastSlot", 60, 900, 90, {40, 20, 20, 3, 8, 1, 1, 1}},
+                                         Mix{"MissingLeaves", 100, 200, 70, {30, 5, 40, 5, 20, 3, 2, 2}},
+                                         Mix{"MoreLeaves", 100, 200, 8, {20, 40, 40, 5, 20, 3, 2, 2}},
+                                         Mix{"Growing", 5, 6000, 8, {20, 19, 60, 2, 10, 1, 1, 0.02}}),
+                         [](const auto& row) { return row.param.name; });
+
+// The index at its fullest: every address must be found whatever was deleted beside it.
+TEST_F(Tracked, FindsEveryBlockOfAFullTableInAnyOrder) {
+    std::mt19937 engine{17};
+    std::vector<void*> blocks;
+    for (int round = 0; round < 4; ++round) {
+        while (blocks.size() < kCapacity) {
+            blocks.push_back(malloc_ckerr(engine() % 100));
+            ASSERT_NE(blocks.back(), nullptr);
+        }
+        std::shuffle(blocks.begin(), blocks.end(), engine);
+        for (const std::size_t left = round == 3 ? 0 : 3000; blocks.size() > left; blocks.pop_back())
+            free_ckerr(blocks.back());
+    }
+}
+
+}  // namespace
