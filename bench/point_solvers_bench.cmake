@@ -1,0 +1,1 @@
+quo_bench(point_solvers SOURCES point_solvers_bench.cpp COMPONENTS point_solvers)
