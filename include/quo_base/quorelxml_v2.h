@@ -9,6 +9,7 @@
 #include <cstdint>
 #include <memory>
 #include <string>
+#include <string_view>
 
 #include "quo_base/api.h"
 
@@ -29,7 +30,8 @@
  *
  * Headers are read without network access, without entity substitution and without loading of DTDs; a document
  * that declares anything in a DTD of its own, nests deeper than 256 elements or holds a text above 10 million
- * characters counts as unreadable. File names hold at most 511 bytes; a longer one is refused, never cut.
+ * characters counts as unreadable. A file above 256 MiB, or one that memory is too short for, gives 7 and is never
+ * replaced by a fresh document. File names hold at most 511 bytes; a longer one is refused, never cut.
  *
  * Operations return 0, 1 (refused: missing field, bad argument, file that cannot be read or saved) or 7 (out of
  * memory) unless said otherwise. One object serves one thread at a time. */
@@ -128,17 +130,25 @@ protected:
     std::int32_t numberOfChannels() const noexcept { return number_of_channels_; }
     bool loaded() const noexcept { return document_ != nullptr; }
     int storeFileName(const char* file_name) noexcept;
+    /** Inserts a processing instruction before the root element, unless something stands there already. */
+    int insertInstruction(const char* name, const char* content) noexcept;
 
 private:
     friend struct quo::RegistryAccess;
     friend class GeneralSAR_BaseXML;
 
+    struct Operations;
     enum class Exactness : std::uint8_t { kDefault, kExact, kRounded };
+
+    void mirrorDescription(std::string_view text);
+    void printMissing(int channel, const char* field) const;
 
     std::shared_ptr<quo::HeaderDocument> document_;  // shared with a header session while one is open
     std::string file_name_, description_, format_;
     std::int32_t number_of_channels_ = 0;
     bool debug_ = false;
+    bool irreplaceable_ =
+        false;  // the file is there but does not fit into memory: no fresh document may replace it
     Exactness exactness_ = Exactness::kDefault;
 };
 
@@ -170,6 +180,7 @@ public:
     bool scalar = false;           ///< the first registration had count 1
     bool registered = false;       ///< set after the first registration; `scalar` is fixed from then on
     std::size_t room = kTextRoom;  ///< room of each text
+    bool text_array = false;       ///< `pointer` is an array of texts, whatever the count
 
     int setElement(const char* element_name, void* values, ParameterType value_type, std::int32_t value_count,
                    double lowest, double highest, bool is_mandatory) noexcept;
@@ -259,9 +270,14 @@ private:
     friend struct quo::RegistryAccess;
 
     int addElement(const char* name, void* values, parElement::ParameterType type, int count, double minimum,
-                   double maximum, bool mandatory, std::size_t room = parElement::kTextRoom);
-    bool readElement(const parElement& element, int count);
+                   double maximum, bool mandatory);
+    int attach(const char* file);
+    bool textsCanBeStored() const;
     int writeElement(const parElement& element);
+    int writeSection();
+    bool readElement(const parElement& element, int count);
+    bool readScalars();
+    bool readEverything();
 
     std::int32_t element_count_ = 0;
     std::int32_t cursor_ = 0;
@@ -270,7 +286,7 @@ private:
     bool list_owned_ = true;
     quorelxml document_;
     std::int32_t channel_ = 0;
-    std::string header_file_, section_;
+    std::string section_;
     std::int64_t source_length_ = -1;  // bytes of the file being read, -1 while there is none
 };
 

@@ -53,8 +53,11 @@ struct RegistryAccess {
  * key failed. */
 bool read_profile_fields(std::span<const FieldValue> fields, const char* section, const char* file);
 
-/** Copies one field's values; both sides have the same type and, for arrays, the same count. */
+/** Copies one field's values; both sides have the same type and count. */
 void copy_values(const FieldValue& from, const FieldValue& to);
+void copy_values(const parElement& from, const parElement& to);
+/** The registered element of this name if it holds values now, else null. */
+const parElement* registered_array(const GeneralSAR_BaseXML& object, const char* name);
 
 /** Name of the first element in which two objects of one class differ (bit for bit; texts as far as their NUL),
  * null when there is none. */
@@ -321,9 +324,9 @@ public:
         if (has_arrays()) to.destroyBuffers();
         for (const Field<Owner>& field : fields_)
             if (!field.is_array_of_any_length()) copy_values(field.at(source), field.at(to));
-        if (has_allocated(source)) {
+        if (has_allocated(from)) {
             if (const int status = to.createBuffers()) return status;
-            copy_arrays(source, to);
+            copy_arrays(from, to);
         }
         RegistryAccess::refresh(to);
         return QUO_OK;
@@ -357,16 +360,18 @@ private:
     [[nodiscard]] constexpr bool has_arrays() const {
         return std::ranges::any_of(fields_, &Field<Owner>::is_array_of_any_length);
     }
-    [[nodiscard]] bool has_allocated(Owner& object) const {
+    [[nodiscard]] bool has_allocated(const Owner& object) const {
         return std::ranges::any_of(fields_, [&](const Field<Owner>& field) {
-            return field.is_array_of_any_length() && field.at(object).count > 0;
+            return field.is_array_of_any_length() && registered_array(object, field.name);
         });
     }
-    void copy_arrays(Owner& from, Owner& to) const {
+    // Arrays are copied as they are registered: a length member may have been changed since they were allocated.
+    void copy_arrays(const Owner& from, Owner& to) const {
         for (const Field<Owner>& field : fields_) {
             if (!field.is_array_of_any_length()) continue;
-            const FieldValue source = field.at(from), target = field.at(to);
-            if (source.count == target.count) copy_values(source, target);
+            const parElement *source = registered_array(from, field.name),
+                             *target = registered_array(to, field.name);
+            if (source && target && source->count == target->count) copy_values(*source, *target);
         }
     }
     bool read_profile_part(Owner& object, const char* file, const char* section, bool arrays) const {

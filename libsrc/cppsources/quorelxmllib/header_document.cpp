@@ -1,0 +1,297 @@
+#include "quorelxmllib/header_document.h"
+
+#include <fcntl.h>
+#include <libxml/parser.h>
+#include <libxml/xmlsave.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+
+#include "quo_base/api.h"
+#include "sarutillib/file_io.h"
+#include "sarutillib/number_text.h"
+
+namespace quo {
+namespace {
+
+constexpr const char* kRoot = "QuorelXmlDoc";
+constexpr const char* kChannel = "Channel";
+constexpr const char* kNumber = "Number";
+
+// A tree takes up to thirty times the memory of its text; the largest headers have a few megabytes.
+constexpr std::int64_t kMostBytes = 256LL << 20;
+
+const xmlChar* xml(const char* text) {
+    return reinterpret_cast<const xmlChar*>(text);
+}
+
+// --- reading ----------------------------------------------------------------------------------------------------
+
+struct Source {
+    Descriptor file;
+    std::int64_t bytes = 0;
+    bool too_long = false;
+};
+
+int read_source(void* context, char* buffer, int length) {
+    auto& source = *static_cast<Source*>(context);
+    ssize_t got = 0;
+    do got = ::read(source.file.get(), buffer, static_cast<std::size_t>(length));
+    while (got < 0 && errno == EINTR);
+    if (got > 0) source.bytes += got;
+    source.too_long = source.bytes > kMostBytes;
+    return source.too_long ? -1 : static_cast<int>(got);
+}
+
+/** A parser that stops at the first declaration in a DTD: entities declared there could grow without bound. */
+std::unique_ptr<xmlParserCtxt, decltype(&xmlFreeParserCtxt)> make_parser() {
+    xmlParserCtxt* parser = xmlNewParserCtxt();
+    if (parser) {
+        const auto stop = [](void* context) { xmlStopParser(static_cast<xmlParserCtxt*>(context)); };
+        static constexpr auto kStop = +stop;
+        xmlSAXHandler& events = *parser->sax;
+        events.entityDecl = [](void* context, auto...) { kStop(context); };
+        events.notationDecl = [](void* context, auto...) { kStop(context); };
+        events.attributeDecl = [](void* context, const xmlChar*, const xmlChar*, int, int, const xmlChar*,
+                                  xmlEnumeration* values) {
+            xmlFreeEnumeration(values);
+            kStop(context);
+        };
+        events.elementDecl = [](void* context, auto...) { kStop(context); };
+        events.unparsedEntityDecl = [](void* context, auto...) { kStop(context); };
+    }
+    return {parser, &xmlFreeParserCtxt};
+}
+
+int open_source(const char* file, Source& source) {
+    source.file = Descriptor{::open(file, O_RDONLY | O_CLOEXEC)};
+    if (!source.file) return errno == ENOMEM ? QUO_NO_MEMORY : QUO_REFUSED;
+    struct stat found {};
+    const bool usable = ::fstat(source.file.get(), &found) == 0 && !S_ISDIR(found.st_mode);
+    return usable ? QUO_OK : QUO_REFUSED;
+}
+
+}  // namespace
+
+int HeaderDocument::load(const char* file, std::shared_ptr<HeaderDocument>& document) {
+    Source source;
+    if (const int status = open_source(file, source)) return status;
+    const auto parser = make_parser();
+    if (!parser) return QUO_NO_MEMORY;
+    constexpr int kOptions =
+        XML_PARSE_NOBLANKS | XML_PARSE_COMPACT | XML_PARSE_NONET | XML_PARSE_NOERROR | XML_PARSE_NOWARNING;
+    std::unique_ptr<xmlDoc, FreeXml> tree{
+        xmlCtxtReadIO(parser.get(), read_source, nullptr, &source, nullptr, nullptr, kOptions)};
+    // A parser that ran out of memory, or stopped at a text that is too long, hands over the part that it has and
+    // calls it well-formed.
+    if (source.too_long || parser->errNo == XML_ERR_NO_MEMORY) return QUO_NO_MEMORY;
+    if (!tree || parser->disableSAX) return QUO_REFUSED;
+    document = std::make_shared<HeaderDocument>(tree.get(), source.bytes);
+    (void)tree.release();
+    return QUO_OK;
+}
+
+std::shared_ptr<HeaderDocument> HeaderDocument::create() {
+    std::unique_ptr<xmlDoc, FreeXml> tree{xmlNewDoc(xml("1.0"))};
+    xmlNode* root = tree ? xmlNewDocNode(tree.get(), nullptr, xml(kRoot), nullptr) : nullptr;
+    if (!root) return nullptr;
+    xmlDocSetRootElement(tree.get(), root);
+    if (!xmlNewTextChild(root, nullptr, xml("NumberOfChannels"), xml("0")) ||
+        !xmlNewTextChild(root, nullptr, xml("Description"), xml("My description")))
+        return nullptr;
+    auto document = std::make_shared<HeaderDocument>(tree.get(), -1);
+    (void)tree.release();
+    return document;
+}
+
+// --- saving -----------------------------------------------------------------------------------------------------
+
+namespace {
+
+/** Collects the serializer's small pieces into large writes. */
+class Sink {
+public:
+    explicit Sink(const char* file) : file_{file} { pending_.reserve(kPiece); }
+
+    bool take(std::string_view bytes) {
+        if (pending_.size() + bytes.size() > kPiece) flush();
+        if (bytes.size() > kPiece) return file_.write(bytes);
+        pending_ += bytes;  // within the reserved room: cannot throw
+        return file_.good();
+    }
+    bool commit() {
+        flush();
+        return file_.good() && file_.commit();
+    }
+    [[nodiscard]] bool good() const { return file_.good(); }
+
+private:
+    static constexpr std::size_t kPiece = 256U << 10U;
+
+    void flush() {
+        if (!pending_.empty()) file_.write(pending_);
+        pending_.clear();
+    }
+
+    AtomicFile file_;
+    std::string pending_;
+};
+
+int write_sink(void* context, const char* bytes, int length) {
+    return static_cast<Sink*>(context)->take({bytes, static_cast<std::size_t>(length)}) ? length : -1;
+}
+
+}  // namespace
+
+bool HeaderDocument::save(const char* file) const {
+    Sink sink{file};
+    if (!sink.good()) return false;
+    // Without an encoder the text, which is UTF-8 in memory, is written as it stands: the bytes are those of
+    // xmlSaveFormatFileEnc.
+    xmlOutputBuffer* output = xmlOutputBufferCreateIO(write_sink, nullptr, &sink, nullptr);
+    if (!output) return false;
+    return xmlSaveFormatFileTo(output, tree_.get(), "UTF-8", 1) >= 0 && sink.commit();
+}
+
+// --- looking up -------------------------------------------------------------------------------------------------
+
+NodeText::NodeText(xmlNode* node) noexcept {
+    const xmlNode* child = node->children;
+    if (!child) return;
+    const bool is_text = child->type == XML_TEXT_NODE || child->type == XML_CDATA_SECTION_NODE;
+    const xmlChar* text = is_text && !child->next ? child->content : nullptr;
+    if (!text) {
+        copy_.reset(xmlNodeGetContent(node));
+        text = copy_.get();
+    }
+    if (text) text_ = reinterpret_cast<const char*>(text);
+}
+
+bool is_named(const xmlNode* node, std::string_view name) noexcept {
+    if (node->type != XML_ELEMENT_NODE || node->ns) return false;
+    return reinterpret_cast<const char*>(node->name) == name;
+}
+
+namespace {
+
+/** Value of an attribute, empty when there is none. It is one piece of text: entities are not declared here. */
+std::string_view attribute(const xmlNode* node, const char* name) {
+    const xmlAttr* found = xmlHasNsProp(node, xml(name), nullptr);
+    const bool has_text = found && found->children && found->children->content;
+    return has_text ? reinterpret_cast<const char*>(found->children->content) : std::string_view{};
+}
+
+}  // namespace
+
+xmlNode* HeaderDocument::root() const noexcept {
+    xmlNode* node = xmlDocGetRootElement(tree_.get());
+    return node && is_named(node, kRoot) ? node : nullptr;
+}
+
+xmlNode* HeaderDocument::find(std::string_view name) const noexcept {
+    const xmlNode* parent = root();
+    if (!parent) return nullptr;
+    xmlNode* node = parent->children;
+    while (node && !is_named(node, name)) node = node->next;
+    return node;
+}
+
+xmlNode* HeaderDocument::next_channel(xmlNode* node, int channel) noexcept {
+    const NumberText number = format_int(channel);
+    while (node && !(is_named(node, kChannel) && attribute(node, kNumber) == std::string_view{number}))
+        node = node->next;
+    return node;
+}
+
+xmlNode* HeaderDocument::first_channel(int channel) const noexcept {
+    const xmlNode* parent = root();
+    return parent ? next_channel(parent->children, channel) : nullptr;
+}
+
+xmlNode* HeaderDocument::first(int channel, std::string_view path) const noexcept {
+    xmlNode* found = nullptr;
+    visit(channel, path, [&](xmlNode* node) {
+        found = node;
+        return false;
+    });
+    return found;
+}
+
+std::vector<xmlNode*> HeaderDocument::all(int channel, std::string_view path, std::size_t most) const {
+    std::vector<xmlNode*> found;
+    if (most > 0)
+        visit(channel, path, [&](xmlNode* node) {
+            found.push_back(node);
+            return found.size() < most;
+        });
+    return found;
+}
+
+bool HeaderDocument::can_hold(std::int64_t count) const noexcept {
+    if (count < 0) return false;
+    return source_bytes_ < 0 || count <= source_bytes_ / 2 + written_values_;
+}
+
+// --- changing ---------------------------------------------------------------------------------------------------
+
+xmlNode* HeaderDocument::append(xmlNode* parent, std::string_view name) {
+    // Blanks that were the whole text of an element would keep its new children from being indented.
+    if (parent->children && parent->children == parent->last && xmlIsBlankNode(parent->children))
+        remove(parent->children);
+    // No content, rather than an empty one: an empty text node would be written as <a></a> and stop the
+    // indentation.
+    return xmlNewChild(parent, nullptr, xml(std::string{name}.c_str()), nullptr);
+}
+
+xmlNode* HeaderDocument::append_channel(int channel) {
+    xmlNode* node = append(root(), kChannel);
+    return node && set_attribute(node, kNumber, format_int(channel).data) ? node : nullptr;
+}
+
+xmlNode* HeaderDocument::ensure(int channel, std::string_view path) {
+    if (xmlNode* found = first(channel, path)) return found;
+    if (path.empty()) return nullptr;
+    const auto slash = path.rfind('/');
+    const bool top = slash == std::string_view::npos;
+    xmlNode* parent = ensure(channel, top ? std::string_view{} : path.substr(0, slash));
+    return parent ? append(parent, top ? path : path.substr(slash + 1)) : nullptr;
+}
+
+bool HeaderDocument::set_text(xmlNode* node, std::string_view text) {
+    xmlNode* content = nullptr;
+    if (!text.empty()) {
+        content = xmlNewDocTextLen(tree_.get(), xml(text.data()), static_cast<int>(text.size()));
+        if (!content) return false;
+        if (!content->content) {
+            xmlFreeNode(content);
+            return false;
+        }
+    }
+    xmlFreeNodeList(node->children);
+    node->children = node->last = nullptr;
+    if (content) xmlAddChild(node, content);
+    return true;
+}
+
+bool HeaderDocument::insert_instruction(const char* name, const char* content) {
+    xmlNode* before = xmlDocGetRootElement(tree_.get());
+    if (!before || before->prev) return true;
+    xmlNode* instruction = xmlNewDocPI(tree_.get(), xml(name), xml(content));
+    if (!instruction) return false;
+    xmlAddPrevSibling(before, instruction);
+    return true;
+}
+
+void remove(xmlNode* node) noexcept {
+    xmlUnlinkNode(node);
+    xmlFreeNode(node);
+}
+
+bool set_attribute(xmlNode* node, const char* name, const char* value) noexcept {
+    const xmlAttr* attribute = xmlSetNsProp(node, nullptr, xml(name), xml(value));
+    return attribute && attribute->children;
+}
+
+}  // namespace quo

@@ -1,0 +1,111 @@
+#ifndef QUO_HEADER_DOCUMENT_H
+#define QUO_HEADER_DOCUMENT_H
+
+#include <libxml/tree.h>
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace quo {
+
+struct FreeXml {
+    void operator()(xmlDoc* tree) const noexcept { xmlFreeDoc(tree); }
+    void operator()(xmlChar* text) const noexcept { xmlFree(text); }
+};
+
+/** Text of an element: in place where it is one piece, else a copy. */
+class NodeText {
+public:
+    explicit NodeText(xmlNode* node) noexcept;
+    /** NUL-terminated; never null. */
+    [[nodiscard]] const char* c_str() const noexcept { return text_; }
+    operator std::string_view() const noexcept { return text_; }
+
+private:
+    std::unique_ptr<xmlChar, FreeXml> copy_;
+    const char* text_ = "";
+};
+
+/** Whether a node is an element with this name, in no namespace. */
+bool is_named(const xmlNode* node, std::string_view name) noexcept;
+
+/** One header document: the tree, and the look-ups and changes that the field layout needs. Paths are walked name
+ * by name and compared as data: nothing in them is an expression. */
+class HeaderDocument {
+public:
+    /** Parses a header file. 0; 1 when there is none or it is no XML that we accept (see quorelxml_v2.h); 7 when
+     * it does not fit into memory: then nothing may take its place. */
+    static int load(const char* file, std::shared_ptr<HeaderDocument>& document);
+    /** A fresh document, or null when memory is short. */
+    static std::shared_ptr<HeaderDocument> create();
+
+    HeaderDocument(xmlDoc* tree, std::int64_t source_bytes) noexcept : tree_{tree}, source_bytes_{source_bytes} {}
+
+    /** Saves the tree, indented and in UTF-8, replacing the file in one step. On failure errno may tell why. */
+    [[nodiscard]] bool save(const char* file) const;
+
+    /** Whether both `NumberOfChannels` and `Description` stand below the root `QuorelXmlDoc`. */
+    [[nodiscard]] bool is_header() const noexcept { return find("NumberOfChannels") && find("Description"); }
+    /** The element `NumberOfChannels` or `Description` below the root, or null. */
+    [[nodiscard]] xmlNode* find(std::string_view name) const noexcept;
+    /** The first element that a field path leads to, or null. The empty path leads to the channel. */
+    [[nodiscard]] xmlNode* first(int channel, std::string_view path) const noexcept;
+    /** The elements that a field path leads to, in document order, `most` at most. */
+    [[nodiscard]] std::vector<xmlNode*> all(int channel, std::string_view path, std::size_t most) const;
+    /** Calls `see(element)` for every element that a field path leads to, until it answers false. */
+    template <typename See>
+    void visit(int channel, std::string_view path, See see) const {
+        for (xmlNode* node = first_channel(channel); node; node = next_channel(node->next, channel))
+            if (!visit_below(node, path, see)) return;
+    }
+
+    /** Appends a channel and returns it, or null when memory is short. */
+    xmlNode* append_channel(int channel);
+    /** The first element of a path, made (with its parents, below an existing channel) where it is missing. Null
+     * when memory is short. */
+    xmlNode* ensure(int channel, std::string_view path);
+    /** Appends an empty element; null when memory is short. */
+    xmlNode* append(xmlNode* parent, std::string_view name);
+    /** Replaces the content of an element by a text. False when memory is short. */
+    bool set_text(xmlNode* node, std::string_view text);
+    /** Inserts a processing instruction before the root element, unless something stands there already. */
+    bool insert_instruction(const char* name, const char* content);
+
+    /** Whether the document can hold `count` values: those it was read with, of which even the shortest list form
+     * takes two bytes each, and those written since. */
+    [[nodiscard]] bool can_hold(std::int64_t count) const noexcept;
+    void count_written(std::int64_t values) noexcept { written_values_ += values; }
+
+private:
+    template <typename See>
+    static bool visit_below(xmlNode* parent, std::string_view path, See& see) {
+        if (path.empty()) return see(parent);
+        const auto slash = path.find('/');
+        const std::string_view name = path.substr(0, slash);
+        const bool last = slash == std::string_view::npos;
+        const std::string_view rest = last ? std::string_view{} : path.substr(slash + 1);
+        if (!last && rest.empty()) return true;  // a path that ends with a slash leads nowhere
+        for (xmlNode* node = parent->children; node; node = node->next)
+            if (is_named(node, name) && !(last ? see(node) : visit_below(node, rest, see))) return false;
+        return true;
+    }
+    [[nodiscard]] xmlNode* root() const noexcept;
+    [[nodiscard]] xmlNode* first_channel(int channel) const noexcept;
+    [[nodiscard]] static xmlNode* next_channel(xmlNode* node, int channel) noexcept;
+
+    std::unique_ptr<xmlDoc, FreeXml> tree_;
+    std::int64_t source_bytes_;  // -1: made in memory
+    std::int64_t written_values_ = 0;
+};
+
+/** Removes an element with all it holds. */
+void remove(xmlNode* node) noexcept;
+/** Gives an element an attribute with a text, replacing an older one. False when memory is short. */
+bool set_attribute(xmlNode* node, const char* name, const char* value) noexcept;
+
+}  // namespace quo
+
+#endif

@@ -1,0 +1,51 @@
+#ifndef QUO_HEADER_SESSION_H
+#define QUO_HEADER_SESSION_H
+
+#include <memory>
+#include <string>
+
+#include "quo_base/api.h"
+
+namespace quo {
+
+class HeaderDocument;
+
+/** Keeps one header file in memory while a whole product is read or written: header objects that are read from or
+ * written to this file while the session lives share its document. The file is parsed once, at first use, and
+ * saved at most once, by commit(); the bytes on the disk are those of writing object by object. Sessions nest; the
+ * innermost one for a file serves it. */
+class HeaderSession {
+public:
+    explicit HeaderSession(const char* file);
+    ~HeaderSession();
+    HeaderSession(const HeaderSession&) = delete;
+    HeaderSession& operator=(const HeaderSession&) = delete;
+
+    /** Saves what the objects have written; with nothing written the file is not touched. What is not committed is
+     * dropped with the session.
+     * @return 0; 1 when the file cannot be saved; the status of a write that left the document incomplete, which
+     * is then not saved. The old file stays whole. */
+    [[nodiscard]] int commit() noexcept;
+
+    /** The innermost session for a file, or null. */
+    static HeaderSession* find(const char* file) noexcept;
+    /** The session that a document belongs to, or null. */
+    static HeaderSession* owner(const std::shared_ptr<HeaderDocument>& document) noexcept;
+
+    /** The file's document, parsed at the first call; null, and 7 in `status`, when it does not fit into memory. A
+     * missing or foreign file gives a fresh document. */
+    std::shared_ptr<HeaderDocument> document(int& status);
+    /** Notes that an object was written, with its status. */
+    void note_write(int status) noexcept;
+
+private:
+    HeaderSession* outer_;
+    std::string file_;
+    std::shared_ptr<HeaderDocument> document_;
+    int failed_ = QUO_OK;
+    bool changed_ = false;
+};
+
+}  // namespace quo
+
+#endif

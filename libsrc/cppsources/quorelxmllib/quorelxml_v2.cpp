@@ -1,0 +1,489 @@
+#include "quo_base/quorelxml_v2.h"
+
+#include <algorithm>
+#include <atomic>
+#include <cstdio>
+#include <exception>
+#include <limits>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include "diagnosticslib/call_frame.h"
+#include "quorelxmllib/header_document.h"
+#include "quorelxmllib/legacy_list.h"
+#include "quorelxmllib/xml_text.h"
+#include "sarutillib/bounded_text.h"
+#include "sarutillib/number_text.h"
+
+using quo::CallFrame;
+using quo::HeaderDocument;
+
+namespace {
+
+constexpr const char* kSource = "quorelxml_v2";
+constexpr const char* kNumberOfChannels = "NumberOfChannels";
+constexpr const char* kDescription = "Description";
+constexpr std::size_t kNameRoom = 512;
+constexpr std::size_t kDescriptionRoom = 2048;
+constexpr int kPrecision = 15;
+
+std::atomic<bool> exact_numbers = false;
+
+/** Runs an operation whose only exception is a failed allocation. */
+template <typename Operation>
+int guarded(CallFrame& frame, Operation operation) noexcept {
+    try {
+        return operation();
+    } catch (const std::exception&) {
+        return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
+    }
+}
+
+int out_of_memory(CallFrame& frame) noexcept {
+    return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
+}
+
+void print_missing(const char* what) noexcept {
+    std::fprintf(stderr, "File not recognized: %s does not exist\n", what);
+}
+
+/** What a reader's report entries need. */
+struct Reading {
+    const char *function, *type;
+    int channel;
+    const char* field;
+};
+
+void convert(const char* text, std::int32_t& value) noexcept {
+    value = quo::scan_int32(text).value;
+}
+void convert(const char* text, double& value) noexcept {
+    value = quo::scan_double(text).value;
+}
+void convert(const char* text, float& value) noexcept {
+    value = static_cast<float>(quo::scan_double(text).value);
+}
+
+/** Reads up to `count` values from the `val` children of an element; returns how many it had. */
+template <typename T>
+int read_children(xmlNode* node, T* values, int count) noexcept {
+    int read = 0;
+    for (xmlNode* child = node->children; child && read < count; child = child->next)
+        if (quo::is_named(child, "val")) convert(quo::NodeText{child}.c_str(), values[read++]);
+    return read;
+}
+
+/** Reads a numeric field; false when no element bears its name. */
+template <typename T>
+bool read_numbers(const HeaderDocument& document, int channel, std::string_view field, T* values, int count) {
+    xmlNode* first = nullptr;
+    int read = 0;
+    document.visit(channel, field, [&](xmlNode* node) {
+        if (!first) first = node;
+        if (count > 1) read += read_children(node, values + read, count - read);
+        return count > 1 && read < count;
+    });
+    if (first && count == 1) convert(quo::NodeText{first}.c_str(), *values);
+    if (first && count > 1 && read == 0) quo::scan_list(quo::NodeText{first}.c_str(), values, count);
+    return first != nullptr;
+}
+
+}  // namespace
+
+// --- the document as a whole ------------------------------------------------------------------------------------
+
+quorelxml::quorelxml() noexcept = default;
+
+quorelxml::quorelxml(const char* file_name) noexcept {
+    (void)initXmlFile(file_name);
+}
+
+quorelxml::~quorelxml() {
+    (void)clean();
+}
+
+int quorelxml::setDebug(bool debug) noexcept {
+    debug_ = debug;
+    return QUO_OK;
+}
+
+void quorelxml::setExactNumbers(bool exact) noexcept {
+    exact_numbers = exact;
+}
+
+void quorelxml::useExactNumbers(bool exact) noexcept {
+    exactness_ = exact ? Exactness::kExact : Exactness::kRounded;
+}
+
+int quorelxml::storeFileName(const char* file_name) noexcept {
+    CallFrame frame{"quorelxml::storeFileName", kSource};
+    return guarded(frame, [&] {
+        file_name_.clear();
+        const std::string_view name = quo::text_or_empty(file_name);
+        if (name.size() >= kNameRoom) return frame.fail(QUO_REFUSED, "File name too long");
+        file_name_ = name;
+        return frame.success();
+    });
+}
+
+int quorelxml::initXmlFile(const char* file_name) noexcept {
+    CallFrame frame{"quorelxml::initXmlFile", kSource};
+    (void)clean();
+    const int stored = storeFileName(file_name);
+    (void)parse();
+    if (!isRecognized())
+        if (const int status = createDocument()) return frame.callee(status);
+    return stored ? frame.callee(stored) : frame.success();
+}
+
+int quorelxml::parse() noexcept {
+    CallFrame frame{"quorelxml::parse", kSource};
+    return guarded(frame, [&] {
+        document_.reset();
+        const int status = HeaderDocument::load(file_name_.c_str(), document_);
+        CallFrame::drop_errno();  // a missing file is no error here
+        irreplaceable_ = status == QUO_NO_MEMORY;
+        if (irreplaceable_) return frame.fail(status, "Header file does not fit into memory");
+        return status ? frame.silent(status) : frame.success();
+    });
+}
+
+bool quorelxml::isRecognized() noexcept {
+    if (!document_) return false;
+    CallFrame frame{"quorelxml::isRecognized", kSource};
+    xmlNode* number = document_->find(kNumberOfChannels);
+    xmlNode* description = document_->find(kDescription);
+    if (debug_ && !number) print_missing("/QuorelXmlDoc/NumberOfChannels");
+    if (debug_ && !description) print_missing("/QuorelXmlDoc/Description");
+    const int status = guarded(frame, [&] {
+        if (number) number_of_channels_ = quo::scan_int32(quo::NodeText{number}).value;
+        if (description) mirrorDescription(quo::NodeText{description});
+        return frame.success();
+    });
+    return status == QUO_OK && number && description;
+}
+
+void quorelxml::mirrorDescription(std::string_view text) {
+    char cut[kDescriptionRoom];
+    description_.assign(cut, quo::copy_bounded(cut, text));
+}
+
+int quorelxml::createDocument() noexcept {
+    CallFrame frame{"quorelxml::createDocument", kSource};
+    return guarded(frame, [&] {
+        if (irreplaceable_) return frame.fail(QUO_NO_MEMORY, "Header file does not fit into memory");
+        document_ = HeaderDocument::create();
+        if (!document_) return out_of_memory(frame);
+        CallFrame::drop_errno();
+        number_of_channels_ = 0;
+        mirrorDescription(quo::NodeText{document_->find(kDescription)});
+        return frame.success();
+    });
+}
+
+int quorelxml::clean() noexcept {
+    document_.reset();
+    irreplaceable_ = false;
+    return QUO_OK;
+}
+
+int quorelxml::flush() noexcept {
+    CallFrame frame{"quorelxml::flush", kSource};
+    return guarded(frame, [&] {
+        if (!document_) return frame.fail(QUO_REFUSED, "No header document to write");
+        if (!document_->save(file_name_.c_str())) return frame.fail(QUO_REFUSED, "File writing failed!");
+        CallFrame::drop_errno();
+        return frame.success();
+    });
+}
+
+int quorelxml::write() noexcept {
+    CallFrame frame{"quorelxml::write", kSource};
+    // The tree never holds blank or empty text nodes that would keep an element from being indented, so that one
+    // save gives the bytes that saving, loading without blanks and saving again would give.
+    const int status = flush();
+    return status ? frame.callee(status) : frame.success();
+}
+
+int quorelxml::setDescription(const char* file_name, const char* text) noexcept {
+    CallFrame frame{"quorelxml::setDescription", kSource};
+    if (const int status = initXmlFile(file_name)) return frame.callee(status);
+    const int status = guarded(frame, [&] {
+        const auto content = quo::xml_text(quo::text_or_empty(text));
+        if (!content) return frame.fail(QUO_REFUSED, "Text cannot be stored in XML");
+        if (!document_->set_text(document_->find(kDescription), *content)) return out_of_memory(frame);
+        mirrorDescription(*content);
+        const int written = write();
+        return written ? frame.callee(written) : frame.success();
+    });
+    (void)clean();
+    return status;
+}
+
+int quorelxmlPi::initXmlFile(const char* file_name, const char* stylesheet) noexcept {
+    CallFrame frame{"quorelxmlPi::initXmlFile", kSource};
+    if (const int status = quorelxml::initXmlFile(file_name)) return frame.callee(status);
+    return guarded(frame, [&] {
+        const auto path = quo::xml_text(quo::text_or_empty(stylesheet));
+        if (!path) return frame.fail(QUO_REFUSED, "Text cannot be stored in XML");
+        const std::string content = R"(type="text/xsl" href=")" + quo::quoted_text(*path) + '"';
+        const int inserted = insertInstruction("xml-stylesheet", content.c_str());
+        return inserted ? frame.callee(inserted) : frame.success();
+    });
+}
+
+int quorelxml::insertInstruction(const char* name, const char* content) noexcept {
+    CallFrame frame{"quorelxml::insertInstruction", kSource};
+    if (!document_) return frame.fail(QUO_REFUSED, "No header document");
+    return document_->insert_instruction(name, content) ? frame.success() : out_of_memory(frame);
+}
+
+// --- looking up -------------------------------------------------------------------------------------------------
+
+int quorelxml::setXpathExpression(int channel, std::string& expression) {
+    expression = R"(/QuorelXmlDoc/Channel[@Number=")";
+    expression += quo::format_int(channel);
+    expression += R"("])";
+    return QUO_OK;
+}
+
+int quorelxml::setXpathExpression(int channel, const char* field, std::string& expression) {
+    setXpathExpression(channel, expression);
+    const std::string_view path = quo::text_or_empty(field);
+    if (!path.empty()) (expression += '/') += path;
+    return QUO_OK;
+}
+
+void quorelxml::printMissing(int channel, const char* field) const {
+    if (!debug_) return;
+    std::string expression;
+    setXpathExpression(channel, field, expression);
+    print_missing(expression.c_str());
+}
+
+void* quorelxml::getNode(int channel, const char* field) const {
+    return getNode(channel, field, 0);
+}
+
+void* quorelxml::getNode(int channel, const char* field, int index) const {
+    xmlNode* found = nullptr;
+    bool any = false;
+    if (document_ && index >= 0)
+        document_->visit(channel, quo::text_or_empty(field), [&](xmlNode* node) {
+            any = true;
+            if (index-- == 0) found = node;
+            return !found;
+        });
+    if (!any) printMissing(channel, field);
+    return found;
+}
+
+int quorelxml::countNodes(int channel, const char* field) const {
+    int count = 0;
+    if (document_)
+        document_->visit(channel, quo::text_or_empty(field), [&](xmlNode*) {
+            ++count;
+            return count < std::numeric_limits<int>::max();
+        });
+    return count;
+}
+
+bool quorelxml::channelExists(int channel) const {
+    return document_ && getNode(channel, "");
+}
+
+bool quorelxml::fieldExists(int channel, const char* field) const {
+    return document_ && document_->first(channel, quo::text_or_empty(field));
+}
+
+bool quorelxml::fieldHasCount(int channel, const char* field, int count) const {
+    return document_ && countNodes(channel, field) >= count;
+}
+
+// --- changing the tree ------------------------------------------------------------------------------------------
+
+int quorelxml::createChannel(int channel) noexcept {
+    CallFrame frame{"quorelxml::createChannel", kSource};
+    return guarded(frame, [&] {
+        if (!isRecognized())
+            if (const int status = createDocument()) return frame.callee(status);
+        if (document_->first(channel, "")) return frame.success();
+        // A file's count is not to be trusted to leave room for one more.
+        if (number_of_channels_ < std::numeric_limits<std::int32_t>::max()) ++number_of_channels_;
+        if (!document_->append_channel(channel) ||
+            !document_->set_text(document_->find(kNumberOfChannels), quo::format_int(number_of_channels_)))
+            return out_of_memory(frame);
+        return frame.success();
+    });
+}
+
+int quorelxml::createField(int channel, const char* field) noexcept {
+    CallFrame frame{"quorelxml::createField", kSource};
+    return guarded(frame, [&] {
+        const std::string_view path = quo::text_or_empty(field);
+        if (!path.empty() && !quo::is_field_path(path)) return frame.fail(QUO_REFUSED, "Bad field name");
+        if (const int status = createChannel(channel)) return frame.callee(status);
+        return document_->ensure(channel, path) ? frame.success() : out_of_memory(frame);
+    });
+}
+
+int quorelxml::createField(int channel, const char* field, int count) noexcept {
+    CallFrame frame{"quorelxml::createField", kSource};
+    return guarded(frame, [&] {
+        if (const int status = createField(channel, field)) return frame.callee(status);
+        if (count < 2) return frame.success();
+        const std::string_view path = quo::text_or_empty(field);
+        const auto slash = path.rfind('/');
+        const bool top = slash == std::string_view::npos;
+        xmlNode* parent = document_->first(channel, top ? std::string_view{} : path.substr(0, slash));
+        for (int present = countNodes(channel, field); present < count; ++present)
+            if (!document_->append(parent, top ? path : path.substr(slash + 1))) return out_of_memory(frame);
+        return frame.success();
+    });
+}
+
+int quorelxml::clearField(int channel, const char* field) noexcept {
+    CallFrame frame{"quorelxml::clearField", kSource};
+    return guarded(frame, [&] {
+        if (!document_) return frame.success();
+        // The elements of one path never lie inside one another, so all can be found before the first goes.
+        constexpr auto kAll = std::numeric_limits<std::size_t>::max();
+        for (xmlNode* node : document_->all(channel, quo::text_or_empty(field), kAll)) quo::remove(node);
+        return frame.success();
+    });
+}
+
+int quorelxml::setFormat(int count, int type) {
+    format_ = quo::list_format(count, type);
+    return format_.empty() ? QUO_REFUSED : QUO_OK;
+}
+
+// --- reading ----------------------------------------------------------------------------------------------------
+
+/** What the typed readers and writers share. */
+struct quorelxml::Operations {
+    /** Tells the report, in debug mode, that a field is not there. */
+    static int missing(const quorelxml& self, const Reading& reading) {
+        if (!self.debug_) return QUO_REFUSED;
+        char message[2 * kNameRoom + 64];
+        quo::format_bounded(message, sizeof message, "Cannot read %s '%s' in channel %d, from XML file %s",
+                            reading.type, reading.field, reading.channel, self.file_name_.c_str());
+        quo_add_report(message, QUO_WARNING, __builtin_LINE(), reading.function, kSource);
+        return QUO_REFUSED;
+    }
+
+    template <typename T>
+    static int read(const quorelxml& self, const Reading& reading, T* values, int count) noexcept {
+        CallFrame frame{reading.function, kSource};
+        if (!reading.field || (!values && count > 0)) return frame.fail(QUO_REFUSED, "Null argument");
+        const HeaderDocument* document = self.document_.get();
+        if (!document || !read_numbers(*document, reading.channel, reading.field, values, count))
+            return frame.silent(missing(self, reading));
+        CallFrame::drop_errno();
+        return frame.success();
+    }
+
+    /** Sets the texts of a field's elements, which are made where they are missing. `text_of(i)` is the i-th. */
+    template <typename TextOf>
+    static int write(quorelxml& self, CallFrame& frame, int channel, const char* path, int count, TextOf text_of) {
+        if (count < 1) return frame.success();
+        const auto wanted = static_cast<std::size_t>(count);
+        std::vector<xmlNode*> nodes;
+        if (self.document_) nodes = self.document_->all(channel, path, wanted);
+        if (nodes.size() < wanted) {
+            if (const int status = self.createField(channel, path, count)) return frame.callee(status);
+            nodes = self.document_->all(channel, path, wanted);
+        }
+        for (std::size_t i = 0; i < wanted; ++i)
+            if (!set(*self.document_, nodes[i], text_of(i), count > 1 ? i + 1 : 0)) return out_of_memory(frame);
+        self.document_->count_written(count);
+        CallFrame::drop_errno();
+        return frame.success();
+    }
+    /** Sets a value's text and, where it is not 0, its number. */
+    static bool set(HeaderDocument& document, xmlNode* node, std::string_view text, std::size_t number) {
+        if (!document.set_text(node, text)) return false;
+        return number == 0 ||
+               quo::set_attribute(node, "N", quo::format_int(static_cast<std::int64_t>(number)).data);
+    }
+
+    template <typename T, typename Format>
+    static int write_numbers(quorelxml& self, const char* function, int channel, const char* field,
+                             const T* values, int count, Format format) noexcept {
+        CallFrame frame{function, kSource};
+        if (!field || (!values && count > 0)) return frame.fail(QUO_REFUSED, "Null argument");
+        return guarded(frame, [&] {
+            const std::string path = count < 2 ? field : std::string{field} + "/val";
+            return write(self, frame, channel, path.c_str(), count,
+                         [&](std::size_t i) { return format(values[i]); });
+        });
+    }
+
+    static quo::NumberText number_text(const quorelxml& self, double value) noexcept {
+        const bool exact =
+            self.exactness_ == Exactness::kDefault ? exact_numbers.load() : self.exactness_ == Exactness::kExact;
+        return exact ? quo::format_exact(value) : quo::format_general(value, kPrecision);
+    }
+};
+
+int quorelxml::readInt(int channel, const char* field, std::int32_t* values, int count) noexcept {
+    return Operations::read(*this, {"quorelxml::readInt", "int", channel, field}, values, count);
+}
+int quorelxml::readFloat(int channel, const char* field, float* values, int count) noexcept {
+    return Operations::read(*this, {"quorelxml::readFloat", "float", channel, field}, values, count);
+}
+int quorelxml::readDouble(int channel, const char* field, double* values, int count) noexcept {
+    return Operations::read(*this, {"quorelxml::readDouble", "double", channel, field}, values, count);
+}
+
+int quorelxml::readString(int channel, const char* field, char* const* values, int count) noexcept {
+    return readString(channel, field, values, count, std::numeric_limits<std::size_t>::max());
+}
+
+int quorelxml::readString(int channel, const char* field, char* const* values, int count,
+                          std::size_t room) noexcept {
+    constexpr const char* kFunction = "quorelxml::readString";
+    CallFrame frame{kFunction, kSource};
+    if (!field || (!values && count > 0)) return frame.fail(QUO_REFUSED, "Null argument");
+    return guarded(frame, [&] {
+        const auto wanted = static_cast<std::size_t>(std::max(count, 0));
+        std::vector<xmlNode*> nodes;
+        if (document_) nodes = document_->all(channel, field, wanted);
+        if (!document_ || nodes.size() < wanted)
+            return frame.silent(Operations::missing(*this, {kFunction, "string", channel, field}));
+        for (std::size_t i = 0; i < wanted; ++i) quo::copy_bounded(values[i], room, quo::NodeText{nodes[i]});
+        return frame.success();
+    });
+}
+
+// --- writing ----------------------------------------------------------------------------------------------------
+
+int quorelxml::writeInt(int channel, const char* field, const std::int32_t* values, int count) noexcept {
+    return Operations::write_numbers(*this, "quorelxml::writeInt", channel, field, values, count,
+                                     [](std::int32_t value) { return quo::format_int(value); });
+}
+int quorelxml::writeFloat(int channel, const char* field, const float* values, int count) noexcept {
+    return Operations::write_numbers(
+        *this, "quorelxml::writeFloat", channel, field, values, count,
+        [this](float value) { return Operations::number_text(*this, static_cast<double>(value)); });
+}
+int quorelxml::writeDouble(int channel, const char* field, const double* values, int count) noexcept {
+    return Operations::write_numbers(*this, "quorelxml::writeDouble", channel, field, values, count,
+                                     [this](double value) { return Operations::number_text(*this, value); });
+}
+
+int quorelxml::writeString(int channel, const char* field, const char* const* values, int count) noexcept {
+    CallFrame frame{"quorelxml::writeString", kSource};
+    if (!field || (!values && count > 0)) return frame.fail(QUO_REFUSED, "Null argument");
+    return guarded(frame, [&] {
+        std::vector<std::string> texts;
+        for (int i = 0; i < count; ++i) {
+            auto text = quo::xml_text(quo::text_or_empty(values[i]));
+            if (!text) return frame.fail(QUO_REFUSED, "Text cannot be stored in XML");
+            texts.push_back(std::move(*text));
+        }
+        return Operations::write(*this, frame, channel, field, count,
+                                 [&](std::size_t i) { return std::string_view{texts[i]}; });
+    });
+}

@@ -1,0 +1,424 @@
+#include <algorithm>
+#include <exception>
+#include <new>
+#include <span>
+#include <string_view>
+#include <utility>
+
+#include "diagnosticslib/call_frame.h"
+#include "quo_base/quorelxml_v2.h"
+#include "quorelxmllib/field_table.h"
+#include "quorelxmllib/header_document.h"
+#include "quorelxmllib/header_session.h"
+#include "quorelxmllib/xml_text.h"
+#include "sarutillib/bounded_text.h"
+#include "sarutillib/file_io.h"
+
+using quo::CallFrame;
+using quo::HeaderSession;
+
+namespace {
+
+constexpr const char* kSource = "quorelxml_v2";
+constexpr std::size_t kNameRoom = 512;
+
+template <typename Operation>
+int guarded(CallFrame& frame, Operation operation) noexcept {
+    try {
+        return operation();
+    } catch (const std::exception&) {
+        return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
+    }
+}
+
+std::span<char* const> texts_of(const parElement& element, char* const& single) {
+    if (!element.text_array) return {&single, 1};
+    return {static_cast<char* const*>(element.pointer), static_cast<std::size_t>(element.count)};
+}
+
+}  // namespace
+
+// --- the element ------------------------------------------------------------------------------------------------
+
+int parElement::setElement(const char* element_name, void* values, ParameterType value_type,
+                           std::int32_t value_count, double lowest, double highest, bool is_mandatory) noexcept {
+    quo::copy_bounded(name, quo::text_or_empty(element_name));
+    pointer = values;
+    type = value_type;
+    count = value_count;
+    minimum = lowest;
+    maximum = highest;
+    mandatory = is_mandatory;
+    text_array = value_type == typeString && value_count != 1;
+    if (!registered) scalar = value_count == 1;
+    return QUO_OK;
+}
+
+// --- the table --------------------------------------------------------------------------------------------------
+
+GeneralSAR_BaseXML::GeneralSAR_BaseXML() noexcept = default;
+
+GeneralSAR_BaseXML::~GeneralSAR_BaseXML() {
+    (void)destroyElementsVector();
+    allocated_ = false;
+    (void)document_.clean();
+}
+
+int GeneralSAR_BaseXML::createBuffers() {
+    return QUO_OK;
+}
+
+int GeneralSAR_BaseXML::destroyBuffers() {
+    return QUO_OK;
+}
+
+void GeneralSAR_BaseXML::refreshParameters() {}
+
+int GeneralSAR_BaseXML::setParamListAlloc(bool owned) noexcept {
+    list_owned_ = owned;
+    return QUO_OK;
+}
+
+bool GeneralSAR_BaseXML::isBufferAllocated() const noexcept {
+    return allocated_;
+}
+
+int GeneralSAR_BaseXML::setAllocationFlag(bool allocated) noexcept {
+    allocated_ = allocated;
+    return QUO_OK;
+}
+
+int GeneralSAR_BaseXML::elementCount() const noexcept {
+    return element_count_;
+}
+
+const parElement* GeneralSAR_BaseXML::element(int index) const noexcept {
+    return index >= 0 && index < element_count_ ? elements_ + index : nullptr;
+}
+
+void GeneralSAR_BaseXML::setExactNumbers(bool exact) noexcept {
+    document_.useExactNumbers(exact);
+}
+
+int GeneralSAR_BaseXML::createElementsVector(int count) {
+    CallFrame frame{"GeneralSAR_BaseXML::createElementsVector", kSource};
+    (void)destroyElementsVector();  // a class between this one and the object's own may have made a table already
+    if (count < 0) return frame.fail(QUO_REFUSED, "Negative number of elements");
+    elements_ = new (std::nothrow) parElement[static_cast<std::size_t>(count)];
+    if (!elements_) return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
+    element_count_ = count;
+    allocated_ = true;
+    refreshParameters();
+    for (int i = 0; i < element_count_; ++i) elements_[i].registered = true;
+    return frame.success();
+}
+
+int GeneralSAR_BaseXML::destroyElementsVector() noexcept {
+    if (list_owned_) delete[] elements_;
+    elements_ = nullptr;
+    element_count_ = 0;
+    cursor_ = 0;
+    return QUO_OK;
+}
+
+int GeneralSAR_BaseXML::addElement(const char* name, void* values, parElement::ParameterType type, int count,
+                                   double minimum, double maximum, bool mandatory) {
+    if (cursor_ >= element_count_) {
+        freeall_ckerr();
+        return QUO_REFUSED;
+    }
+    elements_[cursor_].setElement(name, values, type, count, minimum, maximum, mandatory);
+    cursor_ = (cursor_ + 1) % element_count_;
+    return QUO_OK;
+}
+
+int GeneralSAR_BaseXML::addElementDouble(const char* name, double* values, int count, double minimum,
+                                         double maximum, bool mandatory) {
+    return addElement(name, values, parElement::typeDouble, count, minimum, maximum, mandatory);
+}
+
+int GeneralSAR_BaseXML::addElementFloat(const char* name, float* values, int count, float minimum, float maximum,
+                                        bool mandatory) {
+    return addElement(name, values, parElement::typeFloat, count, static_cast<double>(minimum),
+                      static_cast<double>(maximum), mandatory);
+}
+
+int GeneralSAR_BaseXML::addElementInt(const char* name, std::int32_t* values, int count, int minimum, int maximum,
+                                      bool mandatory) {
+    return addElement(name, values, parElement::typeInt, count, minimum, maximum, mandatory);
+}
+
+int GeneralSAR_BaseXML::addElementString(const char* name, char* text, bool mandatory) {
+    return addElementText(name, text, parElement::kTextRoom, mandatory);
+}
+
+int GeneralSAR_BaseXML::addElementText(const char* name, char* text, std::size_t room, bool mandatory) {
+    const int slot = cursor_;
+    if (const int status = addElement(name, text, parElement::typeString, 1, 0.0, 0.0, mandatory)) return status;
+    elements_[slot].room = room;
+    return QUO_OK;
+}
+
+int GeneralSAR_BaseXML::addElementString(const char* name, char** texts, int count, bool mandatory) {
+    const int slot = cursor_;
+    if (const int status = addElement(name, texts, parElement::typeString, count, 0.0, 0.0, mandatory))
+        return status;
+    elements_[slot].text_array = true;
+    return QUO_OK;
+}
+
+bool GeneralSAR_BaseXML::sourceCanHold(std::int64_t count) const noexcept {
+    if (count < 0) return false;
+    // Every value takes a digit and a separator at least.
+    if (source_length_ >= 0) return count <= source_length_ / 2 + 1;
+    return !document_.document_ || document_.document_->can_hold(count);
+}
+
+// --- the header file --------------------------------------------------------------------------------------------
+
+int GeneralSAR_BaseXML::setAuxiliaryFile(const char* file, int channel, const char* section) noexcept {
+    CallFrame frame{"GeneralSAR_BaseXML::setAuxiliaryFile", kSource};
+    return guarded(frame, [&] {
+        (void)unsetAuxiliaryFile();
+        const std::string_view name = quo::text_or_empty(section);
+        if (name.empty() || name.size() >= kNameRoom) return frame.fail(QUO_REFUSED, "Bad section name");
+        section_ = name;
+        if (const int status = attach(file)) return frame.callee(status);
+        channel_ = channel;
+        return frame.success();
+    });
+}
+
+int GeneralSAR_BaseXML::attach(const char* file) {
+    HeaderSession* session = HeaderSession::find(file);
+    if (!session) return document_.initXmlFile(file);
+    if (const int status = document_.storeFileName(file)) return status;
+    int status = QUO_OK;
+    document_.document_ = session->document(status);
+    if (status == QUO_OK) (void)document_.isRecognized();
+    return status;
+}
+
+int GeneralSAR_BaseXML::unsetAuxiliaryFile() noexcept {
+    (void)document_.storeFileName("");
+    (void)document_.clean();
+    channel_ = 0;
+    return QUO_OK;
+}
+
+int GeneralSAR_BaseXML::cleanAuxiliaryFile() noexcept {
+    CallFrame frame{"GeneralSAR_BaseXML::cleanAuxiliaryFile", kSource};
+    const int status = section_.empty() ? QUO_OK : document_.clearField(channel_, section_.c_str());
+    return status ? frame.callee(status) : frame.success();
+}
+
+bool GeneralSAR_BaseXML::checkAuxiliaryFile() const noexcept {
+    return true;
+}
+
+bool GeneralSAR_BaseXML::checkAuxiliaryFile(const char*, int, const char*) const noexcept {
+    return true;
+}
+
+bool GeneralSAR_BaseXML::getConfigurationFile(const char* file, int channel, const char* section,
+                                              char* text) noexcept {
+    return getConfigurationFile(file, channel, section, text, kNameRoom);
+}
+
+bool GeneralSAR_BaseXML::getConfigurationFile(const char* file, int channel, const char* section, char* text,
+                                              std::size_t room) noexcept {
+    CallFrame frame{"GeneralSAR_BaseXML::getConfigurationFile", kSource};
+    const int status = guarded(frame, [&] {
+        if (const int refused = setAuxiliaryFile(file, channel, section)) return frame.callee(refused);
+        const std::string field = section_ + "/ConfigurationFile";
+        const int missing = document_.readString(channel, field.c_str(), &text, 1, room);
+        return missing ? frame.silent(missing) : frame.success();
+    });
+    (void)unsetAuxiliaryFile();
+    return status == QUO_OK;
+}
+
+// --- writing ----------------------------------------------------------------------------------------------------
+
+bool GeneralSAR_BaseXML::textsCanBeStored() const {
+    return std::all_of(elements_, elements_ + element_count_, [](const parElement& element) {
+        if (element.type != parElement::typeString || element.count < 1) return true;
+        char* const single = static_cast<char*>(element.pointer);
+        return std::ranges::all_of(texts_of(element, single), [](const char* text) {
+            return quo::xml_text(quo::text_or_empty(text)).has_value();
+        });
+    });
+}
+
+int GeneralSAR_BaseXML::writeElement(const parElement& element) {
+    const std::string field = section_ + '/' + element.name;
+    switch (element.type) {
+        case parElement::typeDouble:
+            return document_.writeDouble(channel_, field.c_str(), static_cast<const double*>(element.pointer),
+                                         element.count);
+        case parElement::typeFloat:
+            return document_.writeFloat(channel_, field.c_str(), static_cast<const float*>(element.pointer),
+                                        element.count);
+        case parElement::typeInt:
+            return document_.writeInt(channel_, field.c_str(), static_cast<const std::int32_t*>(element.pointer),
+                                      element.count);
+        case parElement::typeString: {
+            char* const single = static_cast<char*>(element.pointer);
+            return document_.writeString(channel_, field.c_str(), texts_of(element, single).data(), element.count);
+        }
+        case parElement::typeNone:
+            break;
+    }
+    return QUO_REFUSED;
+}
+
+int GeneralSAR_BaseXML::writeSection() {
+    if (const int status = cleanAuxiliaryFile()) return status;
+    for (int i = 0; i < element_count_; ++i)
+        if (elements_[i].count > 0)
+            if (const int status = writeElement(elements_[i])) return status;
+    return QUO_OK;
+}
+
+int GeneralSAR_BaseXML::writeAuxiliaryFile() noexcept {
+    CallFrame frame{"GeneralSAR_BaseXML::writeAuxiliaryFile", kSource};
+    return guarded(frame, [&] {
+        HeaderSession* session = HeaderSession::owner(document_.document_);
+        // A document that other objects share keeps the old section when this object cannot be written.
+        if (!session && !allocated_) (void)cleanAuxiliaryFile();
+        if (!allocated_) return frame.fail(QUO_REFUSED, "Buffers not allocated");
+        if (!textsCanBeStored()) return frame.fail(QUO_REFUSED, "Text cannot be stored in XML");
+
+        const int written = writeSection();
+        if (session) session->note_write(written);
+        const int status = written || session ? written : document_.write();
+        return status ? frame.callee(status) : frame.success();
+    });
+}
+
+int GeneralSAR_BaseXML::writeAuxiliaryFile(const char* file, int channel, const char* section) noexcept {
+    CallFrame frame{"GeneralSAR_BaseXML::writeAuxiliaryFile", kSource};
+    int status = setAuxiliaryFile(file, channel, section);
+    if (status == QUO_OK) status = writeAuxiliaryFile();
+    (void)unsetAuxiliaryFile();
+    return status ? frame.callee(status) : frame.success();
+}
+
+// --- reading ----------------------------------------------------------------------------------------------------
+
+bool GeneralSAR_BaseXML::readElement(const parElement& element, int count) {
+    const std::string field = section_ + '/' + element.name;
+    switch (element.type) {
+        case parElement::typeDouble:
+            return document_.readDouble(channel_, field.c_str(), static_cast<double*>(element.pointer), count) ==
+                   QUO_OK;
+        case parElement::typeFloat:
+            return document_.readFloat(channel_, field.c_str(), static_cast<float*>(element.pointer), count) ==
+                   QUO_OK;
+        case parElement::typeInt:
+            return document_.readInt(channel_, field.c_str(), static_cast<std::int32_t*>(element.pointer),
+                                     count) == QUO_OK;
+        case parElement::typeString: {
+            char* const single = static_cast<char*>(element.pointer);
+            return document_.readString(channel_, field.c_str(), texts_of(element, single).data(), count,
+                                        element.room) == QUO_OK;
+        }
+        case parElement::typeNone:
+            break;
+    }
+    return false;
+}
+
+bool GeneralSAR_BaseXML::readScalars() {
+    for (int i = 0; i < element_count_; ++i) {
+        const parElement& element = elements_[i];
+        if (!element.scalar || element.type == parElement::typeString) continue;
+        if (!readElement(element, 1) && element.mandatory) return false;
+    }
+    return true;
+}
+
+bool GeneralSAR_BaseXML::readEverything() {
+    for (int i = 0; i < element_count_; ++i) {
+        const parElement& element = elements_[i];
+        if (element.count > 0 && !readElement(element, element.count) && element.mandatory) return false;
+    }
+    return true;
+}
+
+int GeneralSAR_BaseXML::readAuxiliaryFile() noexcept {
+    CallFrame frame{"GeneralSAR_BaseXML::readAuxiliaryFile", kSource};
+    return guarded(frame, [&] {
+        const bool scalars = readScalars();
+        // Also after a failure: a length that was read must never stand beside arrays of another length.
+        const int buffers = createBuffers();
+        if (buffers != QUO_OK) (void)destroyBuffers();
+        const bool read = scalars && buffers == QUO_OK && allocated_ && readEverything();
+        return read ? frame.success() : frame.silent(QUO_REFUSED);
+    });
+}
+
+bool GeneralSAR_BaseXML::readAuxiliaryFile(const char* file, int channel, const char* section) noexcept {
+    CallFrame frame{"GeneralSAR_BaseXML::readAuxiliaryFile", kSource};
+    int status = setAuxiliaryFile(file, channel, section);
+    if (status == QUO_OK) status = readAuxiliaryFile();
+    (void)unsetAuxiliaryFile();
+    return (status ? frame.silent(status) : frame.success()) == QUO_OK;
+}
+
+// --- the base of the header objects -----------------------------------------------------------------------------
+
+GeneralSAR_Base::~GeneralSAR_Base() = default;
+
+int GeneralSAR_Base::createBuffers() {
+    return QUO_OK;
+}
+
+int GeneralSAR_Base::destroyBuffers() {
+    return QUO_OK;
+}
+
+void GeneralSAR_Base::refreshParameters() {}
+
+int GeneralSAR_Base::writehdr() {
+    return QUO_OK;
+}
+
+int GeneralSAR_Base::writehdr(const char*) {
+    return QUO_OK;
+}
+
+int GeneralSAR_Base::readhdr(const char*) {
+    return QUO_OK;
+}
+
+// --- the way in for tables --------------------------------------------------------------------------------------
+
+namespace quo {
+
+void RegistryAccess::add(GeneralSAR_BaseXML& object, const FieldValue& field) {
+    if (field.type == parElement::typeString)
+        (void)object.addElementText(field.name, static_cast<char*>(field.pointer), field.room, field.mandatory);
+    else
+        (void)object.addElement(field.name, field.pointer, field.type, field.count, field.minimum, field.maximum,
+                                field.mandatory);
+}
+
+void RegistryAccess::set_allocated(GeneralSAR_BaseXML& object, bool allocated) {
+    (void)object.setAllocationFlag(allocated);
+}
+
+void RegistryAccess::refresh(GeneralSAR_BaseXML& object) {
+    object.refreshParameters();
+}
+
+bool RegistryAccess::can_hold(const GeneralSAR_BaseXML& object, std::int64_t count) {
+    return object.sourceCanHold(count);
+}
+
+void RegistryAccess::set_source(GeneralSAR_BaseXML& object, const char* file) {
+    object.source_length_ = file ? file_length(file).value_or(0) : -1;
+    CallFrame::drop_errno();
+}
+
+}  // namespace quo

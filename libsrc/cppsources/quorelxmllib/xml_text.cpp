@@ -1,0 +1,107 @@
+#include "quorelxmllib/xml_text.h"
+
+#include <libxml/tree.h>
+
+#include <algorithm>
+#include <bit>
+#include <cstddef>
+#include <cstdint>
+
+namespace quo {
+namespace {
+
+// What libxml2 refuses to read back: texts of 10 million bytes and elements nested 256 deep, of which root,
+// channel and `val` take three.
+constexpr std::size_t kLongestText = 9'999'999;
+constexpr std::ptrdiff_t kMostParts = 250;
+constexpr std::size_t kLongestPath = 511;
+
+/** A character at the start of a text; length 0 when no well-formed UTF-8 sequence stands there. */
+struct Character {
+    std::uint32_t code;
+    std::size_t length;
+};
+
+Character decode(std::string_view text) {
+    constexpr std::uint32_t kLeast[] = {0, 0, 0x80, 0x800, 0x10000};  // shortest form only, by length
+    const auto first = static_cast<std::uint8_t>(text.front());
+    if (first < 0x80) return {first, 1};
+    const auto length = static_cast<std::size_t>(std::countl_one(first));
+    if (length < 2 || length > 4 || text.size() < length) return {0, 0};
+    std::uint32_t code = first & (0xFFU >> (length + 1));
+    for (std::size_t i = 1; i < length; ++i) {
+        const auto next = static_cast<std::uint8_t>(text[i]);
+        if ((next & 0xC0U) != 0x80) return {0, 0};
+        code = code << 6U | (next & 0x3FU);
+    }
+    const bool surrogate = code >= 0xD800 && code <= 0xDFFF;
+    return code < kLeast[length] || code > 0x10FFFF || surrogate ? Character{0, 0} : Character{code, length};
+}
+
+constexpr bool is_xml_character(std::uint32_t code) {
+    if (code < 0x20) return code == '\t' || code == '\n' || code == '\r';
+    return code != 0xFFFE && code != 0xFFFF;
+}
+
+void append_latin1(std::string& text, char byte) {
+    const auto code = static_cast<std::uint8_t>(byte);
+    text += static_cast<char>(0xC0U | code >> 6U);
+    text += static_cast<char>(0x80U | (code & 0x3FU));
+}
+
+bool is_element_name(std::string_view name) {
+    return xmlValidateNCName(reinterpret_cast<const xmlChar*>(std::string{name}.c_str()), 0) == 0;
+}
+
+}  // namespace
+
+std::optional<std::string> xml_text(std::string_view text) {
+    std::string result;
+    result.reserve(text.size());
+    while (!text.empty()) {
+        const Character next = decode(text);
+        if (next.length > 0 && !is_xml_character(next.code)) return std::nullopt;
+        if (next.length > 0)
+            result += text.substr(0, next.length);
+        else
+            append_latin1(result, text.front());
+        text.remove_prefix(std::max<std::size_t>(next.length, 1));
+    }
+    if (result.size() > kLongestText) return std::nullopt;
+    return result;
+}
+
+bool is_field_path(std::string_view path) {
+    if (path.size() > kLongestPath || std::ranges::count(path, '/') >= kMostParts) return false;
+    for (;;) {
+        const auto slash = path.find('/');
+        if (!is_element_name(path.substr(0, slash))) return false;
+        if (slash == std::string_view::npos) return true;
+        path.remove_prefix(slash + 1);
+    }
+}
+
+std::string quoted_text(std::string_view text) {
+    std::string result;
+    for (const char c : text) {
+        switch (c) {
+            case '&':
+                result += "&amp;";
+                break;
+            case '<':
+                result += "&lt;";
+                break;
+            case '>':
+                result += "&gt;";
+                break;
+            case '"':
+                result += "&quot;";
+                break;
+            default:
+                result += c;
+        }
+    }
+    return result;
+}
+
+}  // namespace quo
