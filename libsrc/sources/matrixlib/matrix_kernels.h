@@ -50,9 +50,6 @@ struct WeightedPoints {
     void at(int k, double* values, int count) const { basis(x[k], values, count); }
 };
 
-/** Weighted sum of the squared residuals of sum a[1..ma] f_i(x). `values` is scratch for values[1..ma]. */
-double chi_square(const WeightedPoints& points, const double* a, int ma, double* values);
-
 }  // namespace quo
 
 #endif

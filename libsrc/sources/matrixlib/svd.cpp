@@ -248,6 +248,19 @@ void svbksb(double** u, const double* w, double** v, int rows, int n, const doub
     }
 }
 
+// Weighted sum of the squared residuals of sum a[1..ma] f_i(x). `values` is scratch for values[1..ma].
+double chi_square(const WeightedPoints& points, const double* a, int ma, double* values) {
+    double sum = 0.0;
+    for (int k = 0; k < points.n; ++k) {
+        points.at(k, values, ma);
+        double fitted = 0.0;
+        for (int j = 1; j <= ma; ++j) fitted += a[j] * values[j];
+        const double residual = (points.y[k] - fitted) / points.sig[k];
+        sum += residual * residual;
+    }
+    return sum;
+}
+
 void fill_design(const WeightedPoints& points, int ma, double** u, double* b, double* values) {
     for (int k = 0; k < points.n; ++k) {
         points.at(k, values, ma);
@@ -278,6 +291,6 @@ extern "C" int svdfit(const double* x, const double* y, const double* sig, int n
     if (const int status = svdcmp(u, n, ma, w, v)) return frame.callee(status);
     drop_small(w, ma);
     svbksb(u, w, v, n, ma, b.data(), a, work.data() + count + 1);
-    *chisq = quo::chi_square(points, a, ma, work.data());
+    *chisq = chi_square(points, a, ma, work.data());
     return frame.success();
 }

@@ -1,0 +1,3 @@
+find_package(LAPACK REQUIRED)
+find_package(Eigen3 REQUIRED)
+quo_bench(matrix SOURCES matrix_bench.cpp COMPONENTS matrix LINK LAPACK::LAPACK Eigen3::Eigen)
