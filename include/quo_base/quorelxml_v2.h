@@ -276,7 +276,8 @@ private:
     int writeElement(const parElement& element);
     int writeSection();
     bool readElement(const parElement& element, int count);
-    bool readScalars();
+    bool readScalars(bool& lengths_changed);
+    bool hasArrays() const noexcept;
     bool readEverything();
 
     std::int32_t element_count_ = 0;

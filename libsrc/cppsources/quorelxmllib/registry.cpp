@@ -329,13 +329,23 @@ bool GeneralSAR_BaseXML::readElement(const parElement& element, int count) {
     return false;
 }
 
-bool GeneralSAR_BaseXML::readScalars() {
+bool GeneralSAR_BaseXML::readScalars(bool& lengths_changed) {
     for (int i = 0; i < element_count_; ++i) {
         const parElement& element = elements_[i];
         if (!element.scalar || element.type == parElement::typeString) continue;
-        if (!readElement(element, 1) && element.mandatory) return false;
+        const auto* length =
+            element.type == parElement::typeInt ? static_cast<std::int32_t*>(element.pointer) : nullptr;
+        const std::int32_t before = length ? *length : 0;
+        const bool read = readElement(element, 1);
+        lengths_changed = lengths_changed || (length && *length != before);
+        if (!read && element.mandatory) return false;
     }
     return true;
+}
+
+bool GeneralSAR_BaseXML::hasArrays() const noexcept {
+    return std::any_of(elements_, elements_ + element_count_,
+                       [](const parElement& element) { return !element.scalar && element.count > 0; });
 }
 
 bool GeneralSAR_BaseXML::readEverything() {
@@ -349,11 +359,13 @@ bool GeneralSAR_BaseXML::readEverything() {
 int GeneralSAR_BaseXML::readAuxiliaryFile() noexcept {
     CallFrame frame{"GeneralSAR_BaseXML::readAuxiliaryFile", kSource};
     return guarded(frame, [&] {
-        const bool scalars = readScalars();
-        // Also after a failure: a length that was read must never stand beside arrays of another length.
-        const int buffers = createBuffers();
-        if (buffers != QUO_OK) (void)destroyBuffers();
-        const bool read = scalars && buffers == QUO_OK && allocated_ && readEverything();
+        bool lengths_changed = false;
+        const bool scalars = readScalars(lengths_changed);
+        // Also after a failure: a length that was read must never stand beside an array of another length.
+        const bool create = scalars || (lengths_changed && hasArrays());
+        const bool created = create && createBuffers() == QUO_OK;
+        if (create && !created) (void)destroyBuffers();
+        const bool read = scalars && created && allocated_ && readEverything();
         return read ? frame.success() : frame.silent(QUO_REFUSED);
     });
 }
