@@ -1,0 +1,306 @@
+#ifndef QUO_BASE_GENERALSARORBIT_H
+#define QUO_BASE_GENERALSARORBIT_H
+
+#include <cstdint>
+#include <memory>
+#include <vector>
+
+#include "quo_base/api.h"
+#include "quo_base/quorelxml_v2.h"
+
+/** @file
+ * The platform's orbit: its state vectors as a product header lists them, a continuous model through them, and
+ * range-Doppler geolocation on that model.
+ *
+ * Positions are Earth-fixed x, y, z in metres, velocities x, y, z in m/s; arrays of state vectors hold the three
+ * values of each vector in turn. Times are azimuth times in seconds on the library's absolute scale (seconds since
+ * 1985). `range` is always the two-way range time in seconds. Doppler is in Hz, positive while the platform
+ * approaches the target. Angles are in degrees, latitude is geodetic (WGS84, semi-axes 6378137.0 m and
+ * 6356752.314245 m). Ground points of the forward direction lie on the ellipsoid itself.
+ *
+ * Results are 0 for success unless said otherwise; outputs are then written, and otherwise stay as they were.
+ * Whatever needs a model returns 1 while there is none (no state vectors, or computeApproximateSV() has not yet
+ * run since they were made), and 1 for an argument that is null or not finite. Every failure has its entry in the
+ * report. One object serves one thread at a time. */
+
+namespace quo {
+class CallFrame;
+class OrbitModel;
+struct OrbitSample;
+}  // namespace quo
+
+/** State vectors of a product header, with one polynomial through all of them. Section "StateVectorData". */
+class QUO_BASE_API SAROrbitStateVectors_Obj : public GeneralSAR_Base {
+public:
+    SAROrbitStateVectors_Obj();
+    ~SAROrbitStateVectors_Obj() override;
+
+    /** Allocates the arrays for nSV_n state vectors, zero-filled. 0; 1 for a negative count, one that 32 bits
+     * cannot hold three times, or one that the file being read is too short for; 7. Only 0 leaves arrays behind.
+     */
+    int createBuffers() override;
+    int destroyBuffers() override;
+    using GeneralSAR_Base::writehdr;
+    /** Writes the section into the header file. 0, or the status of the write. */
+    int writehdr(const char* file) override;
+    /** Reads the section from the header file, or else from the same file as a parameter file (keys TimeFirst,
+     * TimeDelta, nStateVectors, pos, vel).
+     * @return 0; 7; 4 when neither form is there or complete. A failure leaves the object without vectors. */
+    int readhdr(const char* file) override;
+
+    /** Drops what was there and makes room for `nStateVectors` (>= 0) vectors; the caller fills pSV_m and vSV_mOs.
+     * 0, or the status of createBuffers(). */
+    int SVCreate(double timeFirst, double timeDelta, int nStateVectors) noexcept;
+    int SVDestroy() noexcept;
+    /** Fits the polynomials of degree nSV_n - 1: positions, and velocities of their own. 0; 1 without vectors; or
+     * the status of orb_interp(). A degree above about 15 follows its samples poorly between them. */
+    int SVPolyCompute() noexcept;
+    /** Position (m) and velocity (m/s, the derivative of the position polynomial) at time t. */
+    int SVGetPos(double t, double* xyz) noexcept;
+    int SVGetVel(double t, double* vxyz) noexcept;
+    /** The fitted polynomial of one axis (0, 1, 2 for x, y, z): nSV_n coefficients in (t - t0SV_s), highest degree
+     * first, m and m/s. Null before SVPolyCompute(). */
+    const double* positionPoly(int axis) const noexcept;
+    const double* velocityPoly(int axis) const noexcept;
+    /** Copies vectors and polynomials into `other`. 0; 1 for null; 7. */
+    int clone(SAROrbitStateVectors_Obj* other) noexcept;
+
+    double* pSV_m = nullptr;    ///< nSV_n x 3 positions, m; owned
+    double* vSV_mOs = nullptr;  ///< nSV_n x 3 velocities, m/s; owned
+    double t0SV_s = -999.0;     ///< time of the first vector, s
+    double dtSV_s = -999.0;     ///< spacing, s
+    std::int32_t nSV_n = -999;  ///< number of vectors
+
+protected:
+    void refreshParameters() override;
+
+private:
+    void drop_polynomials() noexcept;
+
+    std::unique_ptr<double[]> polynomials_;  // x, y, z of the positions, then of the velocities, vectors_ each
+    std::int32_t vectors_ = 0;               // that the arrays have room for
+    bool fitted_ = false;
+    int buffer_status_ = 0;  // of the last createBuffers(), which readers cannot pass on
+};
+
+/** What SVCheck() found wrong with the state vectors. */
+struct SVFinding {
+    enum Problem : std::uint8_t {
+        kTooFew,        ///< fewer than five vectors; size is their number
+        kTimes,         ///< first time or spacing not finite, or spacing not positive; size is the spacing
+        kNotFinite,     ///< a position or velocity is not finite; size is 0
+        kInsideEarth,   ///< the position lies more than 50 km below the ellipsoid's polar radius; size is
+                        ///< |position|
+        kDuplicate,     ///< the vector stands where its predecessor stands; size is their distance, m
+        kPositionStep,  ///< the position is off the curve through its neighbours; size is the distance, m
+        kVelocity,      ///< the velocity is not the positions' derivative; size is the difference, m/s
+    };
+    Problem problem;
+    std::int32_t index;  ///< number of the vector, from 0; -1 for the list as a whole
+    double size;
+    char text[120];  ///< the finding in words
+};
+
+/** The orbit model: a degree-4 polynomial through every run of five state vectors, and geolocation on it.
+ *
+ * Between 0.6 and 3.4 spacings after a run's first vector the run stays in use; outside, the run that suits the
+ * direction of travel is taken, so that a sweep in either direction changes runs about once per spacing.
+ * Velocities are the exact derivative of the position polynomials. Times before the first or after the last vector
+ * are extrapolated from the first or last run. */
+class QUO_BASE_API GeneralSAROrbit : public GeneralSAR_Base {
+public:
+    /** An empty orbit, wavelength 0.05623564240544047 m, looking right. */
+    GeneralSAROrbit();
+    /** The same with another wavelength, m. */
+    explicit GeneralSAROrbit(double lambda);
+    ~GeneralSAROrbit() override;
+
+    /** Allocates positions, velocities and the model's tables for nSV_n state vectors, zero-filled; what was there
+     * is dropped, and 0 vectors need nothing. 0; 1 for a negative count, one that 32 bits cannot hold three times,
+     * or one that the file being read is too short for; 7. Only 0 leaves arrays behind. */
+    int createBuffers() override;
+    int destroyBuffers() override;
+    using GeneralSAR_Base::writehdr;
+    /** Writes the section "StateVectorData" into the header file. 0, or the status of the write. */
+    int writehdr(const char* file) override;
+    /** Reads the section from the header file, or else from the same file as a parameter file (keys TimeFirst,
+     * TimeDelta, nStateVectors, pos, vel), and builds the model.
+     * @return 0; 4 when neither form is there or complete; 7; or the status of computeApproximateSV(). A failure
+     * leaves the orbit empty. */
+    int readhdr(const char* file) override;
+    /** Copies vectors, model, wavelength and look sign into `other`. 0; 1 for null; 7, and `other` is then empty.
+     */
+    int clone(GeneralSAROrbit* other) noexcept;
+
+    // --- making an orbit
+    // -----------------------------------------------------------------------------------------
+
+    /** Radar wavelength, m, > 0; 1 for anything else. */
+    int setLambda(double lambda) noexcept;
+    double getLambda() const noexcept;
+    /** Negative looks left, zero or positive right. */
+    int setLookSign(int sign) noexcept;
+    int getLookSign() const noexcept;
+    /** Drops what was there and makes room for at least five vectors. The caller fills pSV_m and vSV_mOs and calls
+     * computeApproximateSV(). 0; 1 ("You must provide at least 5 state vectors!"); or createBuffers()'s status. */
+    int SVCreate(double timeFirst, double timeDelta, int nStateVectors) noexcept;
+    int SVDestroy() noexcept;
+    /** Builds the model from the state vectors; to be called again whenever they, t0SV_s or dtSV_s changed.
+     * @return 0; 1 without at least five vectors, or for times that are not finite or a spacing not above 0; or
+     * the status of orb_interp(), 10 for a position that is not finite. There is no model after a failure. */
+    int computeApproximateSV() noexcept;
+    /** Replaces the state vectors by ones at most `spacing` seconds apart (> 0) over the same span, ends included,
+     * and builds the model anew; the new spacing is the largest that divides the span into at least four.
+     *
+     * Five vectors in a run follow an orbit within 0.03 mm at 10 s, but only within 0.25 m at 60 s. The new
+     * vectors come from an interpolation of order 10 or 12 in positions and velocities (of order 8 in the
+     * positions alone, given at least eight, where the velocities are not their derivative) which is below 1 mm up
+     * to 60 s. Formulas: divided differences with repeated nodes; J. Stoer and R. Bulirsch, "Introduction to
+     * Numerical Analysis", 2002, section 2.1.5.
+     * @return 0; 1 for a spacing that is not positive, without a model, or for more vectors than can be
+     * counted; 7. A failure leaves the orbit as it was. */
+    int SVResample(double spacing) noexcept;
+    /** Largest distance, m, between the model and the interpolation of SVResample() at the places where a run of
+     * five is worst: an estimate of the model's own error. Not-a-number without a model. */
+    double orbitFitError() const noexcept;
+    /** Examines the vectors as they stand, with or without a model, and lists what is wrong with them in their
+     * order. A velocity is compared with the derivative of the curve through the neighbouring vectors.
+     * @return 0, whatever was found; 7. `findings` is replaced. */
+    int SVCheck(std::vector<SVFinding>& findings) const noexcept;
+
+    // --- the orbit at a time
+    // -------------------------------------------------------------------------------------
+
+    int SVGetPos(double t, double* xyz) noexcept;
+    int SVGetVel(double t, double* vxyz) noexcept;
+    /** The same into a result that belongs to the orbit, one for positions and one for velocities, and holds until
+     * the next such call; three not-a-numbers after a failure. */
+    double* SVGetPos(double t) noexcept;
+    double* SVGetVel(double t) noexcept;
+    /** Takes the run of five that suits time t. */
+    int updatePolys(double t) noexcept;
+    /** How often another run was taken since the model was built. */
+    std::int64_t polyUpdates() const noexcept;
+    /** Whether the z velocity of the first state vector is above 0; false without vectors. */
+    bool isAscending() const noexcept;
+
+    // --- from a sample to the ground
+    // ----------------------------------------------------------------------------- Status 10 where no ground
+    // point is seen: the range is shorter than the height or reaches beyond the horizon, or the velocity does not
+    // allow the Doppler.
+
+    /** Ground point seen from a given position with a given velocity, Doppler 0. Needs no state vectors. */
+    int sat2earth(const double pos[3], const double vel[3], double range, double* xyz) noexcept;
+    /** Ground point seen at time t; Doppler 0 unless given. */
+    int sat2earth(double t, double range, double* xyz) noexcept;
+    int sat2earth(double t, double range, double doppler, double* xyz) noexcept;
+    /** The same into the orbit's result point, which holds until the next such call; three not-a-numbers after a
+     * failure. */
+    double* sat2earth(const double pos[3], const double vel[3], double range) noexcept;
+    double* sat2earth(double t, double range) noexcept;
+    double* sat2earth(double t, double range, double doppler) noexcept;
+    /** One coordinate, m; not-a-number after a failure. */
+    double sat2earthX(double t, double range) noexcept;
+    double sat2earthX(double t, double range, double doppler) noexcept;
+    double sat2earthY(double t, double range) noexcept;
+    double sat2earthY(double t, double range, double doppler) noexcept;
+    double sat2earthZ(double t, double range) noexcept;
+    double sat2earthZ(double t, double range, double doppler) noexcept;
+    /** Where a squinted line of sight meets the ellipsoid.
+     *
+     * The line is the one to the zero-Doppler point of (t, range), turned by `squint` degrees towards the
+     * velocity: cos(squint) (line of sight) + sin(squint) (unit velocity).
+     * @param[out] xyz   ground point
+     * @param[out] time  two-way range time along the squinted line, s
+     * @return 0; 10 also where the line passes the Earth by. */
+    int sat2earthSquinted(double t, double range, double squint, double* xyz, double* time) noexcept;
+
+    // --- from the ground to a sample
+    // ----------------------------------------------------------------------------- Status 12 where the point is
+    // not seen with that Doppler between the first and the last state vector. Up to 1e-4 s beyond them counts as
+    // between. Doppler 0 unless given.
+
+    /** Closed-form first guess of time and range time, extrapolated from the end runs for points beyond the orbit.
+     *
+     * With a Doppler it takes one of the two times at which |Doppler| is right: the later one where vx > 0, the
+     * earlier one where vx < 0, whatever the Doppler's sign. 12 where the velocity does not allow the Doppler. */
+    int earth2satLinear(const double xyz[3], double* t, double* rangeTime) noexcept;
+    int earth2satLinear(const double xyz[3], double* t, double* rangeTime, double doppler) noexcept;
+    /** Time and range time at which the point is seen: first guess, then Newton's method on the run of five there,
+     * to 1e-8 s. Where that leaves the run, the search goes on from the other first guess over the whole orbit.
+     * @return 0; 1 without a model, with both outputs -1.0; 12. */
+    int earth2sat(const double xyz[3], double* t, double* rangeTime) noexcept;
+    int earth2sat(const double xyz[3], double* t, double* rangeTime, double doppler) noexcept;
+    /** As earth2sat(), with the first guess found on the coarse polynomial through the whole orbit. */
+    int earth2satPrecise(const double xyz[3], double* t, double* rangeTime) noexcept;
+    int earth2satPrecise(const double xyz[3], double* t, double* rangeTime, double doppler) noexcept;
+    /** One output of earth2sat(): -1.0 without a model, not-a-number after another failure. */
+    double earth2satRange(const double xyz[3]) noexcept;
+    double earth2satRange(double x, double y, double z) noexcept;
+    double earth2satAzimuth(const double xyz[3]) noexcept;
+    double earth2satAzimuth(double x, double y, double z) noexcept;
+
+    // --- geometry of a sample
+    // ------------------------------------------------------------------------------------ Of the ground point
+    // that sat2earth() finds. The short forms return not-a-number after a failure.
+
+    /** Geodetic latitude, and longitude from -180 to 180. */
+    int SVGetLatLon(double t, double range, double doppler, double* latitude, double* longitude) noexcept;
+    int SVGetLatLon(double t, double range, double* latitude, double* longitude) noexcept;
+    double SVGetLat(double t, double range, double doppler) noexcept;
+    double SVGetLat(double t, double range) noexcept;
+    double SVGetLon(double t, double range, double doppler) noexcept;
+    double SVGetLon(double t, double range) noexcept;
+    /** Incidence angle, between the line of sight and the ellipsoid's normal at the target; look angle, at the
+     * platform from the direction to the Earth's centre. */
+    int SVGetAngles(double t, double range, double doppler, double* incidence, double* look) noexcept;
+    int SVGetAngles(double t, double range, double* incidence, double* look) noexcept;
+    double SVGetAnglesIncidence(double t, double range, double doppler) noexcept;
+    double SVGetAnglesIncidence(double t, double range) noexcept;
+    double SVGetAnglesLook(double t, double range, double doppler) noexcept;
+    double SVGetAnglesLook(double t, double range) noexcept;
+    /** Azimuth FM rate d(Doppler)/dt, Hz/s; negative at broadside. */
+    int SVGetFR(double t, double range, double doppler, double* rate) noexcept;
+    int SVGetFR(double t, double range, double* rate) noexcept;
+    double SVGetFR(double t, double range, double doppler) noexcept;
+    double SVGetFR(double t, double range) noexcept;
+    /** Platform speed over the rotating Earth, m/s. */
+    int SVGetSatSpeed(double t, double range, double doppler, double* speed) noexcept;
+    int SVGetSatSpeed(double t, double range, double* speed) noexcept;
+    double SVGetSatSpeed(double t, double range, double doppler) noexcept;
+    double SVGetSatSpeed(double t, double range) noexcept;
+
+    /** Rotation into the along-track frame of velocity v, row by row, and the speed with the sign of v's x
+     * component (positive for 0).
+     *
+     * With yaw = atan(-vy / vx) and pitch = atan(-vz / (sign(vx) hypot(vx, vy))) the rows are
+     * (cos yaw cos pitch, sin yaw, cos yaw sin pitch), (-sin yaw cos pitch, cos yaw, -sin yaw sin pitch) and
+     * (-sin pitch, 0, cos pitch). A vector's coordinate along R's first column is its along-track coordinate,
+     * which divided by `speed` is the time of travel. For v = 0: the identity, speed 0. 0; 1 for a v that is not
+     * finite.
+     */
+    static int computeRotationMatrix(const double v[3], double R[9], double* speed) noexcept;
+
+    double* pSV_m = nullptr;    ///< nSV_n x 3 positions, m; owned
+    double* vSV_mOs = nullptr;  ///< nSV_n x 3 velocities, m/s; owned
+    double t0SV_s = -999.0;     ///< time of the first vector, s
+    double dtSV_s = -999.0;     ///< spacing, s
+    std::int32_t nSV_n = 0;     ///< number of vectors
+
+protected:
+    void refreshParameters() override;
+
+private:
+    bool modelReady() const noexcept;
+    int sampleAt(quo::CallFrame& frame, double t, double range, double doppler, quo::OrbitSample* sample) noexcept;
+    int locate(quo::CallFrame& frame, const double xyz[3], double doppler, bool precise, double* t,
+               double* rangeTime) noexcept;
+
+    std::unique_ptr<quo::OrbitModel> model_;  // tables for allocated vectors; filled by computeApproximateSV()
+    double lambda_ = 0.05623564240544047;
+    std::int32_t look_sign_ = 1;
+    int buffer_status_ = 0;  // of the last createBuffers(), which readers cannot pass on
+    double position_[3] = {}, velocity_[3] = {}, point_[3] = {};
+};
+
+#endif

@@ -1,0 +1,280 @@
+#include "quo_base/generalSARorbit.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstddef>
+#include <limits>
+#include <new>
+#include <utility>
+
+#include "diagnosticslib/call_frame.h"
+#include "generalSAR/orbit_check.h"
+#include "generalSAR/orbit_model.h"
+#include "generalSAR/orbit_table.h"
+
+namespace {
+
+constexpr const char* kSource = "generalSARorbit";
+constexpr const char* kTooFew = "You must provide at least 5 state vectors!";
+constexpr const char* kNoModel = "There are no state vectors, or no model through them";
+constexpr const char* kBadArgument = "An argument is null or not finite";
+constexpr const char* kNoMemory = "Memory allocation failure";
+
+using Obj = GeneralSAROrbit;
+constexpr const auto& kTable = quo::kStateVectorTable<Obj>;
+
+quo::StateVectors states_of(const Obj& orbit) noexcept {
+    return {orbit.pSV_m, orbit.vSV_mOs, orbit.nSV_n, orbit.dtSV_s};
+}
+
+/** Intervals of re-sampled vectors; 0 for more than can be counted. */
+std::int32_t intervals_for(double length, double spacing) noexcept {
+    constexpr double kLeast = quo::OrbitModel::kRunVectors - 1,
+                     kMost = std::numeric_limits<std::int32_t>::max() / 3 - 1;
+    // A length that is a multiple of the spacing but for rounding keeps the spacing.
+    const double wanted = std::max(kLeast, std::ceil(length / spacing * (1.0 - 1e-12)));
+    return wanted <= kMost ? static_cast<std::int32_t>(wanted) : 0;
+}
+
+/** Distance between a run's curve and the interpolation, `u` spacings after the run's first vector, m. */
+double distance_at(const quo::OrbitModel& model, const quo::StateInterpolation& truth, std::int32_t k,
+                   double u) noexcept {
+    double position[3], velocity[3];
+    truth.at(k + u, position, velocity);
+    return quo::norm(quo::orbit_position(model.run(k).curve(), u * model.spacing()) - quo::load(position));
+}
+
+/** Largest such distance where the run is in use. */
+double worst_distance(const quo::OrbitModel& model, const quo::StateInterpolation& truth,
+                      std::int32_t k) noexcept {
+    // Where u (u - 1) (u - 2) (u - 3) (u - 4), the shape of the error, is largest: at the ends of the part in use
+    // and half-way between its vectors; and beyond those ends where no other run takes over.
+    constexpr double kPlaces[] = {0.6, 1.456, 2.544, 3.4}, kFirst = 0.3555, kLast = 3.6445;
+    double worst = 0.0;
+    for (const double u : kPlaces) worst = std::max(worst, distance_at(model, truth, k, u));
+    if (k == 0) worst = std::max(worst, distance_at(model, truth, k, kFirst));
+    if (k == model.runs() - 1) worst = std::max(worst, distance_at(model, truth, k, kLast));
+    return worst;
+}
+
+}  // namespace
+
+Obj::GeneralSAROrbit() {
+    createElementsVector(kTable.size());
+}
+
+Obj::GeneralSAROrbit(double lambda) : GeneralSAROrbit{} {
+    lambda_ = lambda;
+}
+
+Obj::~GeneralSAROrbit() {
+    Obj::destroyBuffers();
+}
+
+void Obj::refreshParameters() {
+    kTable.register_all(*this);
+}
+
+int Obj::createBuffers() {
+    quo::CallFrame frame{"GeneralSAROrbit::createBuffers", kSource};
+    model_.reset();
+    buffer_status_ = quo::create_state_vectors(*this);
+    if (buffer_status_ == QUO_OK && nSV_n >= quo::OrbitModel::kRunVectors) {
+        model_ = quo::OrbitModel::create(nSV_n);
+        if (!model_) buffer_status_ = QUO_NO_MEMORY;
+    }
+    if (buffer_status_ == QUO_OK) return frame.success();
+    Obj::destroyBuffers();
+    return frame.fail(buffer_status_, quo::buffer_message(buffer_status_));
+}
+
+int Obj::destroyBuffers() {
+    model_.reset();
+    return kTable.destroy_buffers(*this);
+}
+
+int Obj::writehdr(const char* file) {
+    quo::CallFrame frame{"GeneralSAROrbit::writehdr", kSource};
+    if (const int status = writeAuxiliaryFile(file, 1, kTable.section())) return frame.callee(status);
+    return frame.success();
+}
+
+int Obj::readhdr(const char* file) {
+    quo::CallFrame frame{"GeneralSAROrbit::readhdr", kSource};
+    int status = quo::read_state_vectors(*this, file, buffer_status_);
+    if (!status) status = computeApproximateSV();
+    if (!status) return frame.success();
+    SVDestroy();
+    return frame.callee(status);
+}
+
+int Obj::clone(GeneralSAROrbit* other) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::clone", kSource};
+    if (!other) return frame.fail(QUO_REFUSED, kBadArgument);
+    if (other == this) return frame.success();
+    if (const int status = kTable.copy(*this, *other)) return frame.callee(status);
+    if (model_ && other->model_ && model_->vectors() == other->model_->vectors()) other->model_->copy(*model_);
+    other->lambda_ = lambda_;
+    other->look_sign_ = look_sign_;
+    return frame.success();
+}
+
+int Obj::setLambda(double lambda) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::setLambda", kSource};
+    if (!(lambda > 0.0 && std::isfinite(lambda))) return frame.fail(QUO_REFUSED, "The wavelength is not positive");
+    lambda_ = lambda;
+    return frame.success();
+}
+
+double Obj::getLambda() const noexcept {
+    return lambda_;
+}
+
+int Obj::setLookSign(int sign) noexcept {
+    look_sign_ = sign;
+    return QUO_OK;
+}
+
+int Obj::getLookSign() const noexcept {
+    return look_sign_;
+}
+
+int Obj::SVCreate(double timeFirst, double timeDelta, int nStateVectors) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::SVCreate", kSource};
+    SVDestroy();
+    if (nStateVectors < quo::OrbitModel::kRunVectors) return frame.fail(QUO_REFUSED, kTooFew);
+    t0SV_s = timeFirst;
+    dtSV_s = timeDelta;
+    nSV_n = nStateVectors;
+    if (const int status = createBuffers()) return frame.callee(status);
+    return frame.success();
+}
+
+int Obj::SVDestroy() noexcept {
+    return destroyBuffers();
+}
+
+bool Obj::modelReady() const noexcept {
+    return model_ && model_->ready();
+}
+
+int Obj::computeApproximateSV() noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::computeApproximateSV", kSource};
+    if (!model_ || model_->vectors() != nSV_n) return frame.fail(QUO_REFUSED, kTooFew);
+    model_->drop();
+    if (!quo::OrbitModel::valid_times(t0SV_s, dtSV_s, nSV_n))
+        return frame.fail(QUO_REFUSED, "The times of the state vectors are not finite or do not increase");
+    if (const int status = model_->build(states_of(*this), t0SV_s)) return frame.callee(status);
+    return frame.success();
+}
+
+int Obj::SVResample(double spacing) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::SVResample", kSource};
+    if (!modelReady() || model_->vectors() != nSV_n) return frame.fail(QUO_REFUSED, kNoModel);
+    if (!(spacing > 0.0 && std::isfinite(spacing))) return frame.fail(QUO_REFUSED, "The spacing is not positive");
+    const double length = model_->length();
+    const std::int32_t intervals = intervals_for(length, spacing);
+    if (intervals == 0) return frame.fail(QUO_REFUSED, "The spacing is too small for the orbit's length");
+
+    const auto values = 3 * (static_cast<std::size_t>(intervals) + 1);
+    std::unique_ptr<double[]> positions{new (std::nothrow) double[values]};
+    std::unique_ptr<double[]> velocities{new (std::nothrow) double[values]};
+    std::unique_ptr<quo::OrbitModel> model = quo::OrbitModel::create(intervals + 1);
+    if (!positions || !velocities || !model) return frame.fail(QUO_NO_MEMORY, kNoMemory);
+
+    const quo::StateVectors old{pSV_m, vSV_mOs, nSV_n, model_->spacing()};
+    const quo::StateVectors fresh{positions.get(), velocities.get(), intervals + 1, length / intervals};
+    const quo::StateInterpolation interpolation{old};
+    for (std::int32_t i = 0; i <= intervals; ++i) {
+        const std::size_t at = 3 * static_cast<std::size_t>(i);
+        interpolation.at(static_cast<double>(i) / intervals * (old.count - 1), &positions[at], &velocities[at]);
+    }
+    if (const int status = model->build(fresh, model_->first_time())) return frame.callee(status);
+
+    delete[] pSV_m;
+    delete[] vSV_mOs;
+    pSV_m = positions.release();
+    vSV_mOs = velocities.release();
+    t0SV_s = model->first_time();
+    dtSV_s = fresh.spacing_s;
+    nSV_n = fresh.count;
+    model_ = std::move(model);
+    refreshParameters();
+    return frame.success();
+}
+
+double Obj::orbitFitError() const noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::orbitFitError", kSource};
+    double worst = 0.0;
+    if (!modelReady() || model_->vectors() != nSV_n) {
+        (void)frame.fail(QUO_REFUSED, kNoModel);
+        return std::numeric_limits<double>::quiet_NaN();
+    }
+    const quo::StateInterpolation truth{states_of(*this)};
+    for (std::int32_t k = 0; k < model_->runs(); ++k) worst = std::max(worst, worst_distance(*model_, truth, k));
+    (void)frame.success();
+    return worst;
+}
+
+int Obj::SVCheck(std::vector<SVFinding>& findings) const noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::SVCheck", kSource};
+    try {
+        quo::StateVectors states = states_of(*this);
+        if (!pSV_m || !vSV_mOs) states.count = 0;
+        findings = quo::check_state_vectors(states, t0SV_s);
+    } catch (const std::bad_alloc&) {
+        return frame.fail(QUO_NO_MEMORY, kNoMemory);
+    }
+    return frame.success();
+}
+
+int Obj::SVGetPos(double t, double* xyz) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::SVGetPos", kSource};
+    if (!modelReady()) return frame.fail(QUO_REFUSED, kNoModel);
+    if (!xyz || !std::isfinite(t)) return frame.fail(QUO_REFUSED, kBadArgument);
+    const quo::OrbitSegment curve = model_->select(t).curve();
+    quo::store(quo::orbit_position(curve, t - model_->reference()), xyz);
+    return frame.success();
+}
+
+int Obj::SVGetVel(double t, double* vxyz) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::SVGetVel", kSource};
+    if (!modelReady()) return frame.fail(QUO_REFUSED, kNoModel);
+    if (!vxyz || !std::isfinite(t)) return frame.fail(QUO_REFUSED, kBadArgument);
+    const quo::OrbitSegment curve = model_->select(t).curve();
+    quo::store(quo::orbit_velocity(curve, t - model_->reference()), vxyz);
+    return frame.success();
+}
+
+double* Obj::SVGetPos(double t) noexcept {
+    if (SVGetPos(t, position_)) std::fill_n(position_, 3, std::numeric_limits<double>::quiet_NaN());
+    return position_;
+}
+
+double* Obj::SVGetVel(double t) noexcept {
+    if (SVGetVel(t, velocity_)) std::fill_n(velocity_, 3, std::numeric_limits<double>::quiet_NaN());
+    return velocity_;
+}
+
+int Obj::updatePolys(double t) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::updatePolys", kSource};
+    if (!modelReady()) return frame.fail(QUO_REFUSED, kNoModel);
+    if (!std::isfinite(t)) return frame.fail(QUO_REFUSED, kBadArgument);
+    model_->select(t);
+    return frame.success();
+}
+
+std::int64_t Obj::polyUpdates() const noexcept {
+    return model_ ? model_->switches() : 0;
+}
+
+bool Obj::isAscending() const noexcept {
+    return nSV_n > 0 && vSV_mOs && vSV_mOs[2] > 0.0;
+}
+
+int Obj::computeRotationMatrix(const double v[3], double R[9], double* speed) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::computeRotationMatrix", kSource};
+    if (!v || !R || !speed || !std::isfinite(v[0] + v[1] + v[2])) return frame.fail(QUO_REFUSED, kBadArgument);
+    quo::along_track_rotation(v, R, speed);
+    return frame.success();
+}

@@ -1,0 +1,338 @@
+#include <algorithm>
+#include <cmath>
+#include <limits>
+
+#include "diagnosticslib/call_frame.h"
+#include "generalSAR/orbit_model.h"
+#include "quo_base/generalSARorbit.h"
+
+namespace quo {
+
+/** One image sample: where the platform is on its run's curve, and the ground point it sees. */
+struct OrbitSample {
+    OrbitSegment curve;
+    double since_run_start_s;
+    Vec3 position, velocity, point;
+};
+
+}  // namespace quo
+
+namespace {
+
+constexpr const char* kSource = "generalSARorbit";
+constexpr const char* kNoModel = "There are no state vectors, or no model through them";
+constexpr const char* kBadArgument = "An argument is null or not finite";
+constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
+
+using Obj = GeneralSAROrbit;
+
+bool finite_point(const double xyz[3]) noexcept {
+    return xyz && std::isfinite(xyz[0] + xyz[1] + xyz[2]);
+}
+
+/** What the point solvers need besides the point. */
+struct Radar {
+    double lambda_m, fd_hz;
+    [[nodiscard]] double range_rate() const noexcept { return 0.5 * lambda_m * fd_hz; }
+};
+
+/** The first guess's two solutions lie to either side of the place abeam; which is right depends on the Doppler's
+ * sign, the guess takes the one further along the signed flight direction. Newton's method mostly mends a wrong
+ * choice within the run. */
+constexpr double kFirstRoot = 1.0, kOtherRoot = -1.0;
+
+/** When the point is seen: on the run that the first guess lands in, else from the other guess through the whole
+ * orbit, else from the nearest state vector. 0 or 12. */
+int find_times(quo::OrbitModel& model, const quo::Vec3& point, const Radar& radar, bool precise, double* t,
+               double* range_s) noexcept {
+    const double lambda = radar.lambda_m, fd = radar.fd_hz;
+    quo::PointTimes guess{};
+    if (!model.long_arc() && model.linear_guess(point, radar.range_rate(), kFirstRoot, &guess)) {
+        if (precise) guess.since_first_s = model.coarse_guess(point, lambda, fd);
+        if (model.solve_near(guess.since_first_s, point, lambda, fd, t, range_s) == QUO_OK) return QUO_OK;
+        if (fd != 0.0) model.linear_guess(point, radar.range_rate(), kOtherRoot, &guess);
+        if (model.solve_anywhere(guess.since_first_s, point, lambda, fd, t, range_s) == QUO_OK) return QUO_OK;
+    }
+    return model.solve_anywhere(model.nearest_start(point), point, lambda, fd, t, range_s);
+}
+
+/** Where a line from S along a unit vector first meets the ellipsoid, as a distance; not-a-number where it passes
+ * by. Squashed to the unit sphere, the line S + d u meets it where |s|^2 + 2 d s.w + d^2 |w|^2 = 1. */
+double distance_to_ellipsoid(const quo::Vec3& S, const quo::Vec3& u, const quo::Ellipsoid& e) noexcept {
+    const double a2 = e.equatorial_m * e.equatorial_m;
+    const double uu = dot(u, ellipsoid_gradient(u, e)), us = dot(u, ellipsoid_gradient(S, e));
+    const double ss = dot(S, ellipsoid_gradient(S, e)) - a2;
+    return (-us - std::sqrt(us * us - uu * ss)) / uu;
+}
+
+}  // namespace
+
+int Obj::sampleAt(quo::CallFrame& frame, double t, double range, double doppler,
+                  quo::OrbitSample* sample) noexcept {
+    if (!modelReady()) return frame.fail(QUO_REFUSED, kNoModel);
+    if (!std::isfinite(t)) return frame.fail(QUO_REFUSED, kBadArgument);
+    sample->curve = model_->select(t).curve();
+    const double u = sample->since_run_start_s = t - model_->reference();
+    sample->position = orbit_position(sample->curve, u);
+    sample->velocity = orbit_velocity(sample->curve, u);
+    const quo::RadarLook look{range, doppler, lambda_, static_cast<double>(look_sign_)};
+    const int status = ground_point(sample->position, sample->velocity, look, quo::kWgs84, &sample->point);
+    return status ? frame.callee(status) : QUO_OK;
+}
+
+// --- from a sample to the ground --------------------------------------------------------------------------------
+
+int Obj::sat2earth(const double pos[3], const double vel[3], double range, double* xyz) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::sat2earth", kSource};
+    if (!pos || !vel || !xyz) return frame.fail(QUO_REFUSED, kBadArgument);
+    const quo::RadarLook look{range, 0.0, lambda_, static_cast<double>(look_sign_)};
+    quo::Vec3 point;
+    if (const int status = ground_point(quo::load(pos), quo::load(vel), look, quo::kWgs84, &point))
+        return frame.callee(status);
+    quo::store(point, xyz);
+    return frame.success();
+}
+
+int Obj::sat2earth(double t, double range, double* xyz) noexcept {
+    return sat2earth(t, range, 0.0, xyz);
+}
+
+int Obj::sat2earth(double t, double range, double doppler, double* xyz) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::sat2earth", kSource};
+    if (!xyz) return frame.fail(QUO_REFUSED, kBadArgument);
+    quo::OrbitSample sample;
+    if (const int status = sampleAt(frame, t, range, doppler, &sample)) return status;
+    quo::store(sample.point, xyz);
+    return frame.success();
+}
+
+double* Obj::sat2earth(const double pos[3], const double vel[3], double range) noexcept {
+    if (sat2earth(pos, vel, range, point_)) std::fill_n(point_, 3, kNaN);
+    return point_;
+}
+
+double* Obj::sat2earth(double t, double range) noexcept {
+    return sat2earth(t, range, 0.0);
+}
+
+double* Obj::sat2earth(double t, double range, double doppler) noexcept {
+    if (sat2earth(t, range, doppler, point_)) std::fill_n(point_, 3, kNaN);
+    return point_;
+}
+
+double Obj::sat2earthX(double t, double range) noexcept {
+    return sat2earthX(t, range, 0.0);
+}
+double Obj::sat2earthX(double t, double range, double doppler) noexcept {
+    double xyz[3] = {kNaN, kNaN, kNaN};
+    sat2earth(t, range, doppler, xyz);
+    return xyz[0];
+}
+double Obj::sat2earthY(double t, double range) noexcept {
+    return sat2earthY(t, range, 0.0);
+}
+double Obj::sat2earthY(double t, double range, double doppler) noexcept {
+    double xyz[3] = {kNaN, kNaN, kNaN};
+    sat2earth(t, range, doppler, xyz);
+    return xyz[1];
+}
+double Obj::sat2earthZ(double t, double range) noexcept {
+    return sat2earthZ(t, range, 0.0);
+}
+double Obj::sat2earthZ(double t, double range, double doppler) noexcept {
+    double xyz[3] = {kNaN, kNaN, kNaN};
+    sat2earth(t, range, doppler, xyz);
+    return xyz[2];
+}
+
+int Obj::sat2earthSquinted(double t, double range, double squint, double* xyz, double* time) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::sat2earthSquinted", kSource};
+    if (!xyz || !time || !std::isfinite(squint)) return frame.fail(QUO_REFUSED, kBadArgument);
+    quo::OrbitSample sample;
+    if (const int status = sampleAt(frame, t, range, 0.0, &sample)) return status;
+
+    const quo::Vec3 line = sample.point - sample.position;
+    const quo::Vec3 abeam = 1.0 / norm(line) * line, ahead = 1.0 / norm(sample.velocity) * sample.velocity;
+    const double angle = squint / quo::kDegPerRad;
+    const quo::Vec3 squinted = std::cos(angle) * abeam + std::sin(angle) * ahead;
+    const double distance = distance_to_ellipsoid(sample.position, squinted, quo::kWgs84);
+    if (!(distance > 0.0)) return frame.fail(QUO_NUMERIC, "The line of sight does not meet the Earth");
+    quo::store(sample.position + distance * squinted, xyz);
+    *time = 2.0 / quo::kLightSpeed * distance;
+    return frame.success();
+}
+
+// --- from the ground to a sample --------------------------------------------------------------------------------
+
+int Obj::earth2satLinear(const double xyz[3], double* t, double* rangeTime) noexcept {
+    return earth2satLinear(xyz, t, rangeTime, 0.0);
+}
+
+int Obj::earth2satLinear(const double xyz[3], double* t, double* rangeTime, double doppler) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::earth2satLinear", kSource};
+    if (!modelReady()) return frame.fail(QUO_REFUSED, kNoModel);
+    const Radar radar{lambda_, doppler};
+    if (!t || !rangeTime || !finite_point(xyz) || !std::isfinite(radar.range_rate()))
+        return frame.fail(QUO_REFUSED, kBadArgument);
+    quo::PointTimes guess{};
+    if (!model_->linear_guess(quo::load(xyz), radar.range_rate(), kFirstRoot, &guess))
+        return frame.callee(QUO_NOT_SEEN);
+    *t = model_->first_time() + guess.since_first_s;
+    *rangeTime = guess.range_s;
+    return frame.success();
+}
+
+int Obj::locate(quo::CallFrame& frame, const double xyz[3], double doppler, bool precise, double* t,
+                double* rangeTime) noexcept {
+    if (!t || !rangeTime) return frame.fail(QUO_REFUSED, kBadArgument);
+    if (!modelReady()) {
+        *t = *rangeTime = -1.0;
+        return frame.fail(QUO_REFUSED, kNoModel);
+    }
+    const Radar radar{lambda_, doppler};
+    if (!finite_point(xyz) || !std::isfinite(radar.range_rate())) return frame.fail(QUO_REFUSED, kBadArgument);
+    if (const int status = find_times(*model_, quo::load(xyz), radar, precise, t, rangeTime))
+        return frame.callee(status);
+    return frame.success();
+}
+
+int Obj::earth2sat(const double xyz[3], double* t, double* rangeTime) noexcept {
+    return earth2sat(xyz, t, rangeTime, 0.0);
+}
+
+int Obj::earth2sat(const double xyz[3], double* t, double* rangeTime, double doppler) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::earth2sat", kSource};
+    return locate(frame, xyz, doppler, false, t, rangeTime);
+}
+
+int Obj::earth2satPrecise(const double xyz[3], double* t, double* rangeTime) noexcept {
+    return earth2satPrecise(xyz, t, rangeTime, 0.0);
+}
+
+int Obj::earth2satPrecise(const double xyz[3], double* t, double* rangeTime, double doppler) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::earth2satPrecise", kSource};
+    return locate(frame, xyz, doppler, true, t, rangeTime);
+}
+
+double Obj::earth2satRange(const double xyz[3]) noexcept {
+    double t = kNaN, range = kNaN;
+    earth2sat(xyz, &t, &range);
+    return range;
+}
+double Obj::earth2satRange(double x, double y, double z) noexcept {
+    const double xyz[3] = {x, y, z};
+    return earth2satRange(xyz);
+}
+double Obj::earth2satAzimuth(const double xyz[3]) noexcept {
+    double t = kNaN, range = kNaN;
+    earth2sat(xyz, &t, &range);
+    return t;
+}
+double Obj::earth2satAzimuth(double x, double y, double z) noexcept {
+    const double xyz[3] = {x, y, z};
+    return earth2satAzimuth(xyz);
+}
+
+// --- geometry of a sample ---------------------------------------------------------------------------------------
+
+int Obj::SVGetLatLon(double t, double range, double doppler, double* latitude, double* longitude) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::SVGetLatLon", kSource};
+    if (!latitude || !longitude) return frame.fail(QUO_REFUSED, kBadArgument);
+    quo::OrbitSample sample;
+    if (const int status = sampleAt(frame, t, range, doppler, &sample)) return status;
+    const quo::Geodetic place = to_geodetic(sample.point, quo::kWgs84);
+    *latitude = place.latitude_deg;
+    *longitude = place.longitude_deg;
+    return frame.success();
+}
+
+int Obj::SVGetAngles(double t, double range, double doppler, double* incidence, double* look) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::SVGetAngles", kSource};
+    if (!incidence || !look) return frame.fail(QUO_REFUSED, kBadArgument);
+    quo::OrbitSample sample;
+    if (const int status = sampleAt(frame, t, range, doppler, &sample)) return status;
+    *incidence = quo::incidence_deg(sample.position, sample.point, quo::kWgs84);
+    *look = quo::look_angle_deg(sample.position, sample.point);
+    return frame.success();
+}
+
+int Obj::SVGetFR(double t, double range, double doppler, double* rate) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::SVGetFR", kSource};
+    if (!rate) return frame.fail(QUO_REFUSED, kBadArgument);
+    quo::OrbitSample sample;
+    if (const int status = sampleAt(frame, t, range, doppler, &sample)) return status;
+    const quo::OrbitState state = orbit_state(sample.curve, sample.since_run_start_s);
+    *rate = quo::fm_rate_hz_s(state, sample.point, lambda_, 0.0);
+    return frame.success();
+}
+
+int Obj::SVGetSatSpeed(double t, double range, double doppler, double* speed) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::SVGetSatSpeed", kSource};
+    if (!speed) return frame.fail(QUO_REFUSED, kBadArgument);
+    quo::OrbitSample sample;
+    if (const int status = sampleAt(frame, t, range, doppler, &sample)) return status;
+    *speed = norm(sample.velocity);
+    return frame.success();
+}
+
+int Obj::SVGetLatLon(double t, double range, double* latitude, double* longitude) noexcept {
+    return SVGetLatLon(t, range, 0.0, latitude, longitude);
+}
+int Obj::SVGetAngles(double t, double range, double* incidence, double* look) noexcept {
+    return SVGetAngles(t, range, 0.0, incidence, look);
+}
+int Obj::SVGetFR(double t, double range, double* rate) noexcept {
+    return SVGetFR(t, range, 0.0, rate);
+}
+int Obj::SVGetSatSpeed(double t, double range, double* speed) noexcept {
+    return SVGetSatSpeed(t, range, 0.0, speed);
+}
+
+double Obj::SVGetLat(double t, double range, double doppler) noexcept {
+    double latitude = kNaN, longitude = kNaN;
+    SVGetLatLon(t, range, doppler, &latitude, &longitude);
+    return latitude;
+}
+double Obj::SVGetLat(double t, double range) noexcept {
+    return SVGetLat(t, range, 0.0);
+}
+double Obj::SVGetLon(double t, double range, double doppler) noexcept {
+    double latitude = kNaN, longitude = kNaN;
+    SVGetLatLon(t, range, doppler, &latitude, &longitude);
+    return longitude;
+}
+double Obj::SVGetLon(double t, double range) noexcept {
+    return SVGetLon(t, range, 0.0);
+}
+double Obj::SVGetAnglesIncidence(double t, double range, double doppler) noexcept {
+    double incidence = kNaN, look = kNaN;
+    SVGetAngles(t, range, doppler, &incidence, &look);
+    return incidence;
+}
+double Obj::SVGetAnglesIncidence(double t, double range) noexcept {
+    return SVGetAnglesIncidence(t, range, 0.0);
+}
+double Obj::SVGetAnglesLook(double t, double range, double doppler) noexcept {
+    double incidence = kNaN, look = kNaN;
+    SVGetAngles(t, range, doppler, &incidence, &look);
+    return look;
+}
+double Obj::SVGetAnglesLook(double t, double range) noexcept {
+    return SVGetAnglesLook(t, range, 0.0);
+}
+double Obj::SVGetFR(double t, double range, double doppler) noexcept {
+    double rate = kNaN;
+    SVGetFR(t, range, doppler, &rate);
+    return rate;
+}
+double Obj::SVGetFR(double t, double range) noexcept {
+    return SVGetFR(t, range, 0.0);
+}
+double Obj::SVGetSatSpeed(double t, double range, double doppler) noexcept {
+    double speed = kNaN;
+    SVGetSatSpeed(t, range, doppler, &speed);
+    return speed;
+}
+double Obj::SVGetSatSpeed(double t, double range) noexcept {
+    return SVGetSatSpeed(t, range, 0.0);
+}

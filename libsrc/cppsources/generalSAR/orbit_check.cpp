@@ -1,0 +1,198 @@
+#include "generalSAR/orbit_check.h"
+
+#include <algorithm>
+#include <array>
+#include <cmath>
+#include <cstdlib>
+#include <utility>
+
+#include "sarutillib/bounded_text.h"
+#include "sarutillib/geometry_kernels.h"
+
+namespace quo {
+namespace {
+
+constexpr std::int32_t kLeastVectors = 5;
+constexpr double kDeepest_m = 50e3;
+// Two vectors closer together than this part of a step are the same one.
+constexpr double kDuplicateStep = 1e-3;
+// What rounding may leave in good positions and velocities.
+constexpr double kPositionNoise_m = 2e-3, kVelocityNoise_m_s = 2e-4;
+// A velocity that is off by so little moves a point by centimetres.
+constexpr double kVelocityTolerance_m_s = 1e-3;
+// A vector is compared with the curve through so many neighbours, which lie at most so far away.
+constexpr std::size_t kNeighbours = 4;
+constexpr std::int32_t kReach = 6;
+
+Vec3 position_of(const StateVectors& states, std::int32_t i) noexcept {
+    return load(states.position(i));
+}
+Vec3 velocity_of(const StateVectors& states, std::int32_t i) noexcept {
+    return load(states.velocity(i));
+}
+bool finite(const Vec3& v) noexcept {
+    return std::isfinite(v.x + v.y + v.z);
+}
+
+struct Wording {
+    SVFinding::Problem problem;
+    const char *words, *unit;
+};
+constexpr Wording kWordings[] = {
+    {SVFinding::kTooFew, "fewer than five", "vectors"},
+    {SVFinding::kTimes, "the times are not finite or do not increase; spacing", "s"},
+    {SVFinding::kNotFinite, "position or velocity is not finite", ""},
+    {SVFinding::kInsideEarth, "the position lies inside the Earth, from its centre", "m"},
+    {SVFinding::kDuplicate, "stands where its predecessor stands, within", "m"},
+    {SVFinding::kPositionStep, "the position is off the curve through its neighbours by", "m"},
+    {SVFinding::kVelocity, "the velocity differs from the derivative of the positions by", "m/s"},
+};
+static_assert(kWordings[SVFinding::kVelocity].problem == SVFinding::kVelocity);
+
+SVFinding make_finding(SVFinding::Problem problem, std::int32_t index, double size) noexcept {
+    const Wording& wording = kWordings[problem];
+    SVFinding finding{problem, index, size, ""};
+    char* text = finding.text;
+    const std::size_t room = sizeof finding.text;
+    if (index < 0)
+        format_bounded(text, room, "state vectors: %s %.6g %s", wording.words, size, wording.unit);
+    else if (problem == SVFinding::kNotFinite)
+        format_bounded(text, room, "state vector %d: %s", static_cast<int>(index), wording.words);
+    else
+        format_bounded(text, room, "state vector %d: %s %.6g %s", static_cast<int>(index), wording.words, size,
+                       wording.unit);
+    return finding;
+}
+
+/** How far a vector lies from the curve through its neighbours, and how much of that is to be expected. */
+struct Deviation {
+    double position_m = 0.0, velocity_m_s = 0.0;
+    double times_expected = 0.0;
+};
+
+/** The examination of one list: vectors one by one, then each against its neighbours. */
+class Examination {
+public:
+    explicit Examination(const StateVectors& states)
+        : states_{states}, usable_(static_cast<std::size_t>(std::max(states.count, 0)), true) {}
+
+    std::vector<SVFinding> findings(double t0) {
+        if (states_.count < kLeastVectors) add(SVFinding::kTooFew, -1, states_.count);
+        const bool times_ok = std::isfinite(t0) && std::isfinite(states_.spacing_s) && states_.spacing_s > 0.0;
+        if (!times_ok) add(SVFinding::kTimes, -1, states_.spacing_s);
+        for (std::int32_t i = 0; i < states_.count; ++i) examine_alone(i);
+        if (times_ok && states_.count >= kLeastVectors) examine_together();
+        std::ranges::stable_sort(findings_, {}, &SVFinding::index);
+        return std::move(findings_);
+    }
+
+private:
+    void add(SVFinding::Problem problem, std::int32_t index, double size) {
+        findings_.push_back(make_finding(problem, index, size));
+        if (index >= 0) usable_[static_cast<std::size_t>(index)] = false;
+    }
+    [[nodiscard]] bool usable(std::int32_t i) const { return usable_[static_cast<std::size_t>(i)]; }
+
+    void examine_alone(std::int32_t i) {
+        const Vec3 position = position_of(states_, i), velocity = velocity_of(states_, i);
+        if (!finite(position) || !finite(velocity)) return add(SVFinding::kNotFinite, i, 0.0);
+        if (norm(position) < kWgs84.polar_m - kDeepest_m) return add(SVFinding::kInsideEarth, i, norm(position));
+        if (i == 0) return;
+        const double step = norm(position - position_of(states_, i - 1));
+        if (step <= kDuplicateStep * std::abs(states_.spacing_s) * norm(velocity))
+            add(SVFinding::kDuplicate, i, step);
+    }
+
+    // A wrong vector bends the curves that its neighbours are compared with, too. So first come those without
+    // which all their neighbours agree; what then still disagrees is wrong together.
+    void examine_together() {
+        std::vector<double> excess(usable_.size());
+        const auto update = [&](std::int32_t from, std::int32_t to) {
+            for (std::int32_t i = std::max(from, 0); i <= std::min(to, states_.count - 1); ++i)
+                excess[static_cast<std::size_t>(i)] = usable(i) ? deviation(i).times_expected : 0.0;
+        };
+        update(0, states_.count - 1);
+        for (std::int32_t i = 0; i < states_.count; ++i) {
+            if (!usable(i) || !explains(excess, i)) continue;
+            report(i, deviation(i));
+            update(i - kReach, i + kReach);
+        }
+        for (std::int32_t i = 0; i < states_.count; ++i)
+            if (excess[static_cast<std::size_t>(i)] > 1.0) report_with_others(i);
+    }
+
+    /** Whether vectors near the i-th disagree with theirs, and none does once the i-th is left out. */
+    [[nodiscard]] bool explains(const std::vector<double>& excess, std::int32_t i) const {
+        const std::int32_t from = std::max(i - kReach, 0), to = std::min(i + kReach, states_.count - 1);
+        if (std::none_of(excess.begin() + from, excess.begin() + to + 1, [](double e) { return e > 1.0; }))
+            return false;
+        for (std::int32_t j = from; j <= to; ++j)
+            if (j != i && usable(j) && deviation(j, i).times_expected > 1.0) return false;
+        return true;
+    }
+
+    void report(std::int32_t i, const Deviation& off) {
+        if (off.position_m > off.velocity_m_s * states_.spacing_s)
+            add(SVFinding::kPositionStep, i, off.position_m);
+        else
+            add(SVFinding::kVelocity, i, off.velocity_m_s);
+    }
+    void report_with_others(std::int32_t i) {
+        const double mismatch = velocity_mismatch_m_s(states_, i);
+        if (mismatch > kVelocityTolerance_m_s)
+            add(SVFinding::kVelocity, i, mismatch);
+        else
+            report(i, deviation(i));
+    }
+
+    /** The nearest usable vectors around the i-th, without it and without `left_out`. */
+    [[nodiscard]] std::span<const std::int32_t> neighbours(std::int32_t i, std::int32_t left_out,
+                                                           std::array<std::int32_t, kNeighbours>& room) const {
+        std::size_t count = 0;
+        for (std::int32_t away = 1; away <= kReach && count < kNeighbours; ++away) {
+            for (const std::int32_t j : {i - away, i + away}) {
+                const bool takes = j >= 0 && j < states_.count && j != left_out && count < kNeighbours;
+                if (takes && usable(j)) room[count++] = j;
+            }
+        }
+        return std::span{room}.first(count);
+    }
+
+    [[nodiscard]] Deviation deviation(std::int32_t i, std::int32_t left_out = -1) const {
+        std::array<std::int32_t, kNeighbours> room;
+        const auto nodes = neighbours(i, left_out, room);
+        if (nodes.size() < kNeighbours) return {};
+        const NodeWeights weights = hermite_weights(nodes, i);
+        double position[3], velocity[3];
+        weights.apply(states_, position, velocity);
+        Deviation off{norm(load(position) - position_of(states_, i)),
+                      norm(load(velocity) - velocity_of(states_, i)), 0.0};
+        const double noise = std::max(kPositionNoise_m, kVelocityNoise_m_s * states_.spacing_s);
+        off.times_expected = std::max(off.position_m, off.velocity_m_s * states_.spacing_s) /
+                             (weights.gain() * noise + truncation_m(i, nodes));
+        return off;
+    }
+
+    /** What a curve of order 8 can miss on a smooth orbit: the eighth derivative of a circle at the platform's own
+     * angular rate, with room for the Earth's rotation and for ellipses. */
+    [[nodiscard]] double truncation_m(std::int32_t i, std::span<const std::int32_t> nodes) const {
+        constexpr double kRoom = 1.5, kFactorial8 = 40320.0;
+        const double radius = norm(position_of(states_, i));
+        double miss = radius / kFactorial8;
+        for (const std::int32_t node : nodes)
+            miss *= std::pow(kRoom * norm(velocity_of(states_, i)) / radius * states_.spacing_s * (i - node), 2.0);
+        return miss;
+    }
+
+    StateVectors states_;
+    std::vector<bool> usable_;  // as a neighbour of others
+    std::vector<SVFinding> findings_;
+};
+
+}  // namespace
+
+std::vector<SVFinding> check_state_vectors(const StateVectors& states, double t0) {
+    return Examination{states}.findings(t0);
+}
+
+}  // namespace quo

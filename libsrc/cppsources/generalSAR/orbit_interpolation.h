@@ -1,0 +1,63 @@
+#ifndef QUO_ORBIT_INTERPOLATION_H
+#define QUO_ORBIT_INTERPOLATION_H
+
+#include <cstddef>
+#include <cstdint>
+#include <span>
+
+namespace quo {
+
+/** Equally spaced state vectors, wherever they lie: count x 3 positions (m) and velocities (m/s). */
+struct StateVectors {
+    const double* positions;
+    const double* velocities;
+    std::int32_t count;
+    double spacing_s;
+
+    [[nodiscard]] const double* position(std::int32_t i) const noexcept { return positions + 3 * std::size_t(i); }
+    [[nodiscard]] const double* velocity(std::int32_t i) const noexcept { return velocities + 3 * std::size_t(i); }
+};
+
+/** What an interpolation polynomial takes from each of its nodes: value = sum of value[j] f_j + slope[j] f'_j, and
+ * likewise its derivative. Times are in spacings. */
+struct NodeWeights {
+    static constexpr std::size_t kMostNodes = 8;
+
+    std::size_t count = 0;
+    std::int32_t node[kMostNodes] = {};
+    double value[kMostNodes] = {}, slope[kMostNodes] = {};
+    double value_rate[kMostNodes] = {}, slope_rate[kMostNodes] = {};
+
+    /** Position and velocity that the nodes give. */
+    void apply(const StateVectors& states, double position_m[3], double velocity_m_s[3]) const noexcept;
+    /** How much an error of the nodes (positions, and velocities times the spacing) can grow to, as a position and
+     * as a velocity times the spacing: the larger of the two. */
+    [[nodiscard]] double gain() const noexcept;
+};
+
+/** Weights at time `s` of the polynomial that takes values and slopes of the nodes: of degree 2 n - 1. */
+NodeWeights hermite_weights(std::span<const std::int32_t> nodes, double s) noexcept;
+/** The same from the values alone: of degree n - 1. */
+NodeWeights lagrange_weights(std::span<const std::int32_t> nodes, double s) noexcept;
+
+/** The interpolation that state vectors are re-sampled by and the 5-point model is judged by: order 12 in
+ * positions and velocities (10 with five vectors), or order 8 in the positions alone where velocities that are not
+ * their derivative would bend the curve by more than 0.1 mm. Needs at least five vectors. */
+class StateInterpolation {
+public:
+    explicit StateInterpolation(const StateVectors& states) noexcept;
+    /** State at `s` spacings after the first vector. */
+    void at(double s, double position_m[3], double velocity_m_s[3]) const noexcept;
+
+private:
+    StateVectors states_;
+    bool use_velocities_;
+};
+
+/** Length of the difference between a vector's velocity and the derivative of the polynomial through the positions
+ * of up to eight vectors around it, m/s. */
+double velocity_mismatch_m_s(const StateVectors& states, std::int32_t i) noexcept;
+
+}  // namespace quo
+
+#endif

@@ -1,0 +1,144 @@
+#ifndef QUO_ORBIT_MODEL_H
+#define QUO_ORBIT_MODEL_H
+
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+
+#include "generalSAR/orbit_interpolation.h"
+#include "sarutillib/geometry_kernels.h"
+
+namespace quo {
+
+/** A straight flight: unit vector and speed, both turned so that the speed has the sign of the velocity's x
+ * component (positive for 0). The turn changes no time of travel; it decides which of two solutions comes first.
+ */
+struct StraightFlight {
+    Vec3 axis;
+    double speed_m_s;
+    double per_speed;  // 1 / speed, 0 for a platform that stands still
+
+    /** Of a finite velocity. */
+    static StraightFlight of(const double velocity_m_s[3]) noexcept;
+    /** Time from the flight's start to one of the two places from which a target at d from the start, m, has the
+     * range rate `rate_m_s` or its negative: the place further along the axis for turn 1, further back for -1. Not
+     * finite where the speed does not allow the rate. */
+    [[nodiscard]] double time_of(const Vec3& d, double rate_m_s, double turn) const noexcept {
+        const double along = dot(axis, d);
+        if (rate_m_s == 0.0) return along * per_speed;
+        // The cone of directions with that rate: the place lies as far along as the target is aside, times this.
+        const double k = rate_m_s * rate_m_s * per_speed * per_speed;
+        const double aside2 = dot(d, d) - along * along;
+        return (along + turn * std::sqrt(k * aside2 / (1.0 - k))) * per_speed;
+    }
+    /** Distance of that target after `time` seconds of flight, m. */
+    [[nodiscard]] double distance(const Vec3& d, double time) const noexcept {
+        return norm(d - (time * speed_m_s) * axis);
+    }
+};
+
+/** A run of five state vectors: the curve through their positions in the time since the first, coefficients as in
+ * interp_orb.h, and the chord from first to last. What one point needs stands together. */
+struct OrbitRun {
+    double x[5], y[5], z[5];
+    StraightFlight chord;
+
+    [[nodiscard]] OrbitSegment curve() const noexcept { return {x, y, z}; }
+    /** Position of the first vector, m. */
+    [[nodiscard]] Vec3 start() const noexcept { return {x[4], y[4], z[4]}; }
+};
+
+/** When a point is seen: time since the first state vector of the orbit, and two-way range time, s. */
+struct PointTimes {
+    double since_first_s, range_s;
+};
+
+/** What an orbit model holds beside its runs. */
+struct OrbitModelValues {
+    double t0_ = 0.0, dt_ = 0.0;  // first vector and spacing
+    std::int32_t current_ = 0;
+    double tc_ = 0.0;                       // time of the current run's first vector
+    double earliest_ = 0.0, latest_ = 0.0;  // the times for which the current run is kept
+    std::int64_t switches_ = 0;
+    StraightFlight mean_{};                                 // from the first vector to the last
+    double coarse_x_[5]{}, coarse_y_[5]{}, coarse_z_[5]{};  // the whole orbit, in the time since the first vector
+    bool long_arc_ = false;
+    bool ready_ = false;
+};
+
+/** The curves through every run of five state vectors, and a coarse one through the whole orbit.
+ *
+ * Range rates are lambda fd / 2, in m/s, positive while the platform approaches. */
+class OrbitModel : private OrbitModelValues {
+public:
+    static constexpr std::int32_t kRunVectors = 5;
+
+    /** Tables for at least five vectors; null when memory cannot be had. */
+    static std::unique_ptr<OrbitModel> create(std::int32_t vectors) noexcept;
+    /** Whether so many vectors can stand at these times. */
+    static bool valid_times(double t0, double dt, std::int32_t vectors) noexcept {
+        const double end = t0 + (vectors - 1) * dt;
+        return std::isfinite(t0) && std::isfinite(end) && end > t0;
+    }
+    /** Fits as many vectors as the tables are for, at valid times. 0 or the status of orb_interp(); there is no
+     * model after a failure. */
+    int build(const StateVectors& states, double t0) noexcept;
+    /** Takes over another model for the same number of vectors. */
+    void copy(const OrbitModel& other) noexcept;
+
+    void drop() noexcept { ready_ = false; }
+
+    [[nodiscard]] bool ready() const noexcept { return ready_; }
+    [[nodiscard]] std::int32_t vectors() const noexcept { return runs_count_ + kRunVectors - 1; }
+    [[nodiscard]] std::int32_t runs() const noexcept { return runs_count_; }
+    [[nodiscard]] const OrbitRun& run(std::int32_t k) const noexcept { return runs_[static_cast<std::size_t>(k)]; }
+    [[nodiscard]] double first_time() const noexcept { return t0_; }
+    [[nodiscard]] double spacing() const noexcept { return dt_; }
+    [[nodiscard]] double length() const noexcept { return (vectors() - 1) * dt_; }
+    [[nodiscard]] std::int64_t switches() const noexcept { return switches_; }
+
+    /** Makes the current run suit time t, which is finite, and returns it. */
+    const OrbitRun& select(double t) noexcept {
+        if (!(earliest_ <= t && t <= latest_)) choose(t);
+        return run(current_);
+    }
+    /** Time of the current run's first vector. */
+    [[nodiscard]] double reference() const noexcept { return tc_; }
+
+    /** First guess of a point's times in closed form, `turn` as in StraightFlight::time_of(). False where the
+     * speed does not allow the range rate. */
+    bool linear_guess(const Vec3& point, double rate_m_s, double turn, PointTimes* guess) const noexcept;
+    /** Time of a point on the coarse curve, for a first guess. */
+    double coarse_guess(const Vec3& point, double lambda_m, double fd_hz) const noexcept;
+    /** When the point is seen: Newton's method from a first guess, on the current run made to suit it. `t` is on
+     * the absolute scale. 0, or 12 when the solution lies outside that run; nothing is then written. */
+    int solve_near(double guess_since_first_s, const Vec3& point, double lambda_m, double fd_hz, double* t,
+                   double* range_s) noexcept;
+    /** The same over the whole orbit, from run to run, until a run holds its own solution; the current run stays.
+     * A solution up to 1e-4 s beyond the first or the last vector counts as on the orbit. */
+    int solve_anywhere(double guess_since_first_s, const Vec3& point, double lambda_m, double fd_hz, double* t,
+                       double* range_s) const noexcept;
+    /** Time since the first vector of the run that starts nearest to the point. */
+    double nearest_start(const Vec3& point) const noexcept;
+    /** Whether the platform flies so far round the Earth that the linear guess means nothing. */
+    [[nodiscard]] bool long_arc() const noexcept { return long_arc_; }
+
+private:
+    OrbitModel(std::unique_ptr<OrbitRun[]> runs, std::int32_t count) noexcept
+        : runs_{std::move(runs)}, runs_count_{count} {}
+    void choose(double t) noexcept;
+    void take(std::int32_t k) noexcept;
+    int fit_runs(const StateVectors& states) noexcept;
+    int fit_whole(const StateVectors& states) noexcept;
+
+    std::unique_ptr<OrbitRun[]> runs_;
+    std::int32_t runs_count_;
+};
+
+/** The rotation into the along-track frame of a finite velocity, and its signed speed; see
+ * GeneralSAROrbit::computeRotationMatrix(). */
+void along_track_rotation(const double v[3], double R[9], double* speed) noexcept;
+
+}  // namespace quo
+
+#endif
