@@ -1,0 +1,243 @@
+#include "quo_base/dataset_info.h"
+
+#include <functional>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include "sarutillib/bounded_text.h"
+#include "support/header_object_suite.h"
+
+namespace {
+
+using Info = DataSetInfo_Obj;
+using test::real, test::text, test::whole;
+
+constexpr auto kOptional = test::Presence::kOptional;
+constexpr auto kXmlOnly = test::Presence::kXmlOnly;
+
+struct DataSetInfo : test::HeaderCase {
+    using Object = Info;
+    static constexpr const char* kSection = "DataSetInfo";
+    static constexpr test::FieldRow kRows[] = {
+        text("OrbitNumber"),
+        text("Track"),
+        text("SenseDate"),
+        text("SceneID"),
+        text("Description"),
+        text("AcquisitionStation"),
+        text("ProcessingCenter"),
+        text("ProcessingDate"),
+        text("ProcessingSoftware"),
+        real("SceneHeading"),
+        text("OrbitConfiguration"),
+        text("Polarization"),
+        text("Swath"),
+        real("SWST_MIN"),
+        real("SWST_MAX"),
+        real("RO_REF", 800000.0),
+        whole("RangeLooks", 1, 1, 1000),
+        real("RangeBandwidth", 0.0, 5),
+        real("ExternalCalibrationFactor", 1.0),
+        text("Projection", "PROJECTION UNDEFINED"),
+        text("ImageType", "NOT SET").is(kOptional),
+        whole("RGAntenna_flag", 0, 0, 1).is(kOptional),
+        whole("AZAntenna_flag", 0, 0, 1).is(kOptional),
+        whole("SpreadLoss_flag", 0, 0, 1).is(kOptional),
+        whole("DroopGain_flag", 0, 0, 1).is(kOptional),
+        whole("RGAntenna_AltitudeCorr_flag", 0, 0, 1).is(kOptional),
+        whole("NoiseCorr_flag", 0, 0, 1).is(kOptional),
+        text("SensorName", "SENSOR UNKNOWN").is(kOptional),
+        text("AcquisitionMode", "ACQUISITION MODE UNDEFINED").is(kOptional),
+        text("RefSystem", "REFERENCE SYSTEM UNDEFINED").is(kOptional),
+        text("UnitType", "UNIT TYPE UNDEFINED").is(kOptional),
+        whole("MissingLines", -1, 0, 2147483647).is(kOptional),
+        whole("LookDirection", 0, 0, 2147483647).is(kXmlOnly),
+    };
+};
+using Cases = testing::Types<DataSetInfo>;
+}  // namespace
+namespace test {
+INSTANTIATE_TYPED_TEST_SUITE_P(Description, HeaderObject, Cases, CaseName);
+}
+namespace {
+
+void put(char* member, std::string_view text) { quo::copy_bounded(member, 512, text); }
+
+/** One enumeration with its setter, its test and its member, whatever its type. */
+struct Classification {
+    const char* name;
+    std::function<int(Info&, int)> set;
+    std::function<bool(const Info&, int)> is;
+    std::function<char*(Info&)> member;
+    std::vector<std::string> texts;  // by value
+};
+
+template <auto Set, auto Is, auto Member, typename Enumeration>
+Classification classification(const char* name, std::vector<std::string> texts) {
+    return {name, [](Info& info, int value) { return (info.*Set)(static_cast<Enumeration>(value)); },
+            [](const Info& info, int value) { return (info.*Is)(static_cast<Enumeration>(value)); },
+            [](Info& info) -> char* { return info.*Member; }, std::move(texts)};
+}
+
+std::vector<Classification> classifications() {
+    return {classification<&Info::SetImageType, &Info::IsImageType, &Info::ImageType, Info::DSImageType>(
+                "ImageType", {"NOT SET", "RANGE FOCUSED", "AZIMUTH FOCUSED", "RAW DATA", "MULTILOOK",
+                              "INTERFEROMETRY", "FLAT EARTH", "COHERENCE MAP", "DEM", "SYNTHETIC FRINGES",
+                              "DEM IMAGE TIMES MAP", "IMAGE HEIGHT MAP", "COREGISTERED SLANT RANGE COMPLEX IMAGE",
+                              "PHASE UNWRAPPED", "RAW DATA ALIGNED"}),
+            classification<&Info::SetSensorType, &Info::IsSensorType, &Info::SensorName, Info::DSSensorType>(
+                "SensorName", {"SENSOR UNKNOWN", "ASAR", "RADARSAT", "ERS1", "ERS2", "PALSAR", "TERRA SAR-X",
+                               "CSKS1", "CSKS2", "CSKS3", "CSKS4"}),
+            classification<&Info::SetAcqMode, &Info::IsAcqMode, &Info::AcquisitionMode, Info::DSAcqMode>(
+                "AcquisitionMode",
+                {"ACQUISITION MODE UNDEFINED", "STRIPMAP", "DOUBLE POLARIZATION", "QUAD POLARIZATION", "SCANSAR"}),
+            classification<&Info::SetProjection, &Info::IsProjection, &Info::Projection, Info::DSProjection>(
+                "Projection", {"PROJECTION UNDEFINED", "GROUND RANGE", "SLANT RANGE", "GEOCODED"}),
+            classification<&Info::SetUnitType, &Info::IsUnitType, &Info::UnitType, Info::DSUnitType>(
+                "UnitType",
+                {"UNIT TYPE UNDEFINED", "VOLT", "VOLT^2", "VOLTcomplex", "meter", "Radian", "Degree", "sec"}),
+            classification<&Info::SetRefSys, &Info::IsRefSys, &Info::RefSystem, Info::DSRefSys>(
+                "RefSystem", {"REFERENCE SYSTEM UNDEFINED", "WGS84", "EGM84"})};
+}
+
+TEST(DataSetInfoClassification, StoresAndRecognisesTheTextOfEachValue) {
+    for (const Classification& kind : classifications()) {
+        SCOPED_TRACE(kind.name);
+        const int values = static_cast<int>(kind.texts.size());
+        for (int set = -1; set <= values + 1; ++set) {
+            Info info;
+            const Info fresh;
+            EXPECT_TRUE(kind.is(info, 0)) << "a new object is not classified";
+            EXPECT_EQ(kind.set(info, set), 0);
+            const bool listed = set >= 0 && set < values;
+            EXPECT_EQ(kind.member(info), kind.texts[listed ? static_cast<std::size_t>(set) : 0]) << set;
+            for (int asked = -1; asked <= values + 1; ++asked)
+                EXPECT_EQ(kind.is(info, asked), asked == (listed ? set : 0)) << set << " is " << asked;
+            if (listed && set > 0) {
+                EXPECT_THAT(test::differing_fields(fresh, info), testing::ElementsAre(kind.name));
+            }
+        }
+    }
+}
+
+TEST(DataSetInfoClassification, ComparesToTheLetter) {
+    for (const Classification& kind : classifications())
+        for (const char* text : {"geocoded", "GEOCODED ", "", "wgs84", "DEM "}) {
+            Info info;
+            put(kind.member(info), text);
+            for (std::size_t value = 0; value < kind.texts.size(); ++value)
+                EXPECT_FALSE(kind.is(info, static_cast<int>(value))) << text;
+        }
+}
+
+TEST(DataSetInfoClassification, NamesItsValues) {
+    Info info;
+    EXPECT_EQ(info.SetType(Info::dsCoherenceMap, Info::dsTerraSarX, Info::dsScansar, Info::dsGeocoded,
+                           Info::dsVoltSquared, Info::dsEgm84),
+              0);
+    EXPECT_STREQ(info.ImageType, "COHERENCE MAP");
+    EXPECT_STREQ(info.SensorName, "TERRA SAR-X");
+    EXPECT_STREQ(info.AcquisitionMode, "SCANSAR");
+    EXPECT_STREQ(info.Projection, "GEOCODED");
+    EXPECT_STREQ(info.UnitType, "VOLT^2");
+    EXPECT_STREQ(info.RefSystem, "EGM84");
+}
+
+TEST(DataSetInfoType, SetsTheReferenceSystemOfGeocodedProductsOnly) {
+    for (int projection = -1; projection <= 5; ++projection) {
+        Info info;
+        put(info.RefSystem, "LOCAL");
+        put(info.Projection, "GEOCODED");  // the projection that counts is the new one
+        info.SetType(Info::dsRawData, Info::dsErs2, Info::dsStripmap, static_cast<Info::DSProjection>(projection),
+                     Info::dsVolt, Info::dsWgs84);
+        EXPECT_STREQ(info.RefSystem, projection == 3 ? "WGS84" : "LOCAL") << projection;
+        EXPECT_STREQ(info.UnitType, "VOLT");
+    }
+}
+
+TEST(DataSetInfoType, HoldsWhenAllSixHold) {
+    Info info;
+    info.SetType(Info::dsRawData, Info::dsErs2, Info::dsStripmap, Info::dsGeocoded, Info::dsMeter, Info::dsWgs84);
+    const auto is = [&info](int image, int sensor, int mode, int projection, int unit, int system) {
+        return info.IsType(static_cast<Info::DSImageType>(image), static_cast<Info::DSSensorType>(sensor),
+                           static_cast<Info::DSAcqMode>(mode), static_cast<Info::DSProjection>(projection),
+                           static_cast<Info::DSUnitType>(unit), static_cast<Info::DSRefSys>(system));
+    };
+    EXPECT_TRUE(is(3, 4, 1, 3, 4, 1));
+    EXPECT_FALSE(is(0, 4, 1, 3, 4, 1));
+    EXPECT_FALSE(is(3, 0, 1, 3, 4, 1));
+    EXPECT_FALSE(is(3, 4, 0, 3, 4, 1));
+    EXPECT_FALSE(is(3, 4, 1, 0, 4, 1));
+    EXPECT_FALSE(is(3, 4, 1, 3, 0, 1));
+    EXPECT_FALSE(is(3, 4, 1, 3, 4, 0));
+}
+
+TEST(DataSetInfoNumbers, FollowTheirTexts) {
+    const struct {
+        const char* text;
+        int polarization, swath;
+    } rows[] = {{"H/H", 0, 666},
+                {"V/V", 1, 666},
+                {"H/V", 2, 666},
+                {"V/H", 3, 666},
+                {"HH", 666, 666},
+                {"h/h", 666, 666},
+                // Deliberate: SS1 is 7, and the others share their numbers with IS3 to IS6.
+                {"SS1", 666, 7},
+                {"SS2", 666, 2},
+                {"SS3", 666, 3},
+                {"SS4", 666, 4},
+                {"SS5", 666, 5},
+                {"IS1", 666, 0},
+                {"IS2", 666, 1},
+                {"IS3", 666, 2},
+                {"IS4", 666, 3},
+                {"IS5", 666, 4},
+                {"IS6", 666, 5},
+                {"IS7", 666, 6},
+                {"IS8", 666, 666},
+                {"SS6", 666, 666},
+                {"IS", 666, 666},
+                {"", 666, 666}};
+    for (const auto& row : rows) {
+        Info info;
+        put(info.Polarization, row.text);
+        put(info.Swath, row.text);
+        EXPECT_EQ(info.getPolarizationNbr(), row.polarization) << row.text;
+        EXPECT_EQ(info.getISNbr(), row.swath) << row.text;
+    }
+    EXPECT_EQ(Info{}.getPolarizationNbr(), 666);
+    EXPECT_EQ(Info{}.getISNbr(), 666);
+}
+
+TEST(DataSetInfoOrigin, IsTheProcessingCenter) {
+    Info info;
+    const Info fresh;
+    EXPECT_EQ(info.fillQUOREL(), 0);
+    EXPECT_STREQ(info.ProcessingCenter, "QUOREL Vestra");
+    EXPECT_THAT(test::differing_fields(fresh, info), testing::ElementsAre("ProcessingCenter"));
+}
+
+TEST(DataSetInfoFile, GivesEachMemberItsOwnValue) {
+    const test::TemporaryFolder folder;
+    const std::string file = folder.file("info.par");
+    test::write_text(file,
+                     "[DataSetInfo]\nTrack = 217\nSWST_MIN = 0.0053\nSWST_MAX = 0.0061\nSensorName = ERS2\n"
+                     "RefSystem = EGM84\nSpreadLoss_flag = 1\nRangeBandwidth = {1.5 2.5 3.5 4.5 5.5}\n"
+                     "MissingLines = 17\nLookDirection = 3\n");
+    Info info;
+    EXPECT_EQ(info.readhdr(file.c_str()), 1);
+    EXPECT_STREQ(info.Track, "217");
+    EXPECT_EQ(info.SWST_MIN, 0.0053);
+    EXPECT_EQ(info.SWST_MAX, 0.0061);
+    EXPECT_STREQ(info.SensorName, "ERS2");
+    EXPECT_STREQ(info.RefSystem, "EGM84");
+    EXPECT_EQ(info.SpreadLoss_flag, 1);
+    EXPECT_THAT(info.RangeBandwidth, testing::ElementsAre(1.5, 2.5, 3.5, 4.5, 5.5));
+    EXPECT_EQ(info.MissingLines, 17);
+    EXPECT_EQ(info.LookDirection, 0) << "parameter files do not have the look direction";
+}
+
+}  // namespace

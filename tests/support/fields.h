@@ -1,0 +1,210 @@
+#ifndef QUO_TESTS_SUPPORT_FIELDS_H
+#define QUO_TESTS_SUPPORT_FIELDS_H
+
+#include <gtest/gtest.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <cstdio>
+#include <cstring>
+#include <span>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "quo_base/quorelxml_v2.h"
+
+/** Header objects seen from outside: what their documentation promises, field by field, and the means to fill,
+ * compare, print and damage them without knowing their class. */
+namespace test {
+
+enum class Presence { kMandatory, kOptional, kProfileOptional, kXmlOnly };
+
+/** What is promised of one field. */
+struct FieldRow {
+    const char* name;
+    parElement::ParameterType type;
+    int count;
+    double number;     // default of every value of a number
+    const char* text;  // default of a text
+    const char* key = name;
+    Presence presence = Presence::kMandatory;
+    double minimum = 0.0, maximum = 0.0;
+
+    [[nodiscard]] constexpr FieldRow keyed(const char* other) const {
+        FieldRow row = *this;
+        row.key = other;
+        return row;
+    }
+    [[nodiscard]] constexpr FieldRow is(Presence other) const {
+        FieldRow row = *this;
+        row.presence = other;
+        return row;
+    }
+    [[nodiscard]] bool mandatory_in_xml() const {
+        return presence == Presence::kMandatory || presence == Presence::kProfileOptional;
+    }
+    [[nodiscard]] bool mandatory_in_profile() const { return presence == Presence::kMandatory; }
+};
+
+constexpr FieldRow real(const char* name, double value = -999.0, int count = 1) {
+    return {name, parElement::typeDouble, count, value, ""};
+}
+constexpr FieldRow whole(const char* name, double value, double minimum = 0.0, double maximum = 0.0) {
+    return {name, parElement::typeInt, 1, value, "", name, Presence::kMandatory, minimum, maximum};
+}
+constexpr FieldRow text(const char* name, const char* value = "NOT_AVAILABLE") {
+    return {name, parElement::typeString, 1, 0.0, value};
+}
+
+/** Every digit of a number. */
+inline std::string digits(double value) {
+    char buffer[40];
+    std::snprintf(buffer, sizeof buffer, "%.17g", value);
+    return buffer;
+}
+
+/** The values of one element, each as text that tells any two apart. */
+inline std::vector<std::string> values_of(const parElement& element) {
+    std::vector<std::string> values;
+    for (std::ptrdiff_t i = 0; i < element.count; ++i) {
+        switch (element.type) {
+            case parElement::typeDouble:
+                values.push_back(digits(static_cast<const double*>(element.pointer)[i]));
+                break;
+            case parElement::typeFloat:
+                values.push_back(digits(static_cast<double>(static_cast<const float*>(element.pointer)[i])));
+                break;
+            case parElement::typeInt:
+                values.push_back(std::to_string(static_cast<const std::int32_t*>(element.pointer)[i]));
+                break;
+            case parElement::typeString:
+                values.emplace_back(element.count == 1 ? static_cast<const char*>(element.pointer)
+                                                       : static_cast<char* const*>(element.pointer)[i]);
+                break;
+            case parElement::typeNone:
+                values.emplace_back("no type");
+                break;
+        }
+    }
+    return values;
+}
+
+/** Gives every value of the object a number or text of its own. The numbers have few digits, so that "%.15g" keeps
+ * them, and the same seed makes the same values. */
+inline void fill_fields(const GeneralSAR_BaseXML& object, int seed = 1) {
+    for (int i = 0; i < object.elementCount(); ++i) {
+        const parElement& element = *object.element(i);
+        for (int k = 0; k < element.count; ++k) {
+            const int number = 803457 + 7919 * seed + 37 * i + k;
+            const std::string words = "Value " + std::to_string(number) + " <& more";
+            switch (element.type) {
+                case parElement::typeDouble:
+                    static_cast<double*>(element.pointer)[k] = number / 1000.0;
+                    break;
+                case parElement::typeFloat:
+                    static_cast<float*>(element.pointer)[k] = static_cast<float>(number) / 7.0F;
+                    break;
+                case parElement::typeInt:
+                    static_cast<std::int32_t*>(element.pointer)[k] = number;
+                    break;
+                case parElement::typeString: {
+                    char* to = element.count == 1 ? static_cast<char*>(element.pointer)
+                                                  : static_cast<char**>(element.pointer)[k];
+                    std::snprintf(to, element.room, "%s", words.c_str());
+                    break;
+                }
+                case parElement::typeNone:
+                    ADD_FAILURE() << element.name << " has no type";
+                    break;
+            }
+        }
+    }
+}
+
+/** Names of the elements in which two objects of one class differ. */
+inline std::vector<std::string> differing_fields(const GeneralSAR_BaseXML& a, const GeneralSAR_BaseXML& b) {
+    EXPECT_EQ(a.elementCount(), b.elementCount());
+    std::vector<std::string> names;
+    for (int i = 0; i < a.elementCount(); ++i)
+        if (values_of(*a.element(i)) != values_of(*b.element(i))) names.emplace_back(a.element(i)->name);
+    return names;
+}
+
+/** Names of all elements, in the order of registration. */
+inline std::vector<std::string> field_names(const GeneralSAR_BaseXML& object) {
+    std::vector<std::string> names;
+    for (int i = 0; i < object.elementCount(); ++i) names.emplace_back(object.element(i)->name);
+    return names;
+}
+
+/** Compares a new object with what is promised: order, names, types, counts, bounds, which fields must be present,
+ * defaults. */
+inline void expect_fields(const GeneralSAR_BaseXML& object, std::span<const FieldRow> rows) {
+    ASSERT_EQ(object.elementCount(), static_cast<int>(rows.size()));
+    for (int i = 0; i < object.elementCount(); ++i) {
+        const parElement& element = *object.element(i);
+        const FieldRow& row = rows[static_cast<std::size_t>(i)];
+        SCOPED_TRACE(row.name);
+        EXPECT_STREQ(element.name, row.name);
+        EXPECT_EQ(element.type, row.type);
+        EXPECT_EQ(element.count, row.count);
+        EXPECT_EQ(element.minimum, row.minimum);
+        EXPECT_EQ(element.maximum, row.maximum);
+        EXPECT_EQ(element.mandatory, row.mandatory_in_xml());
+        const std::string value = row.type == parElement::typeString ? row.text : digits(row.number);
+        EXPECT_EQ(values_of(element), std::vector<std::string>(static_cast<std::size_t>(row.count), value));
+    }
+}
+
+/** The object as one section of a parameter file, under the promised keys; `left_out` is a key to leave out and
+ * `cut_short` one whose list loses its last value. */
+inline std::string profile_text(const GeneralSAR_BaseXML& object, const char* section,
+                                std::span<const FieldRow> rows, std::string_view left_out = "",
+                                std::string_view cut_short = "") {
+    std::string file = "[" + std::string{section} + "]\n";
+    for (std::size_t i = 0; i < rows.size(); ++i) {
+        if (rows[i].key == left_out) continue;
+        std::vector<std::string> values = values_of(*object.element(static_cast<int>(i)));
+        const bool list = values.size() > 1;
+        if (rows[i].key == cut_short) values.pop_back();
+        std::string line;
+        for (const std::string& value : values) line += (line.empty() ? "" : " ") + value;
+        file += std::string{rows[i].key} + " = " + (list ? "{" + line + "}" : line) + "\n";
+    }
+    return file;
+}
+
+/** One element of a header file as written, tags included; empty when there is none. */
+inline std::string element_text(const std::string& file, const std::string& name) {
+    const auto start = file.find("<" + name + ">"), end = file.find("</" + name + ">");
+    return start == file.npos || end == file.npos ? "" : file.substr(start, end + name.size() + 3 - start);
+}
+
+/** A header file without one element. */
+inline std::string without_element(std::string file, const std::string& name) {
+    const std::string element = element_text(file, name);
+    EXPECT_NE(element, "") << name;
+    return file.erase(file.find(element), element.size());
+}
+
+/** Names of an element's children, in the order of the file. */
+inline std::vector<std::string> child_names(const std::string& file, const std::string& parent) {
+    const std::string inside = element_text(file, parent);
+    std::vector<std::string> names;
+    int depth = 0;
+    for (auto tag = inside.find('<'); tag != inside.npos; tag = inside.find('<', tag + 1)) {
+        const auto end = inside.find('>', tag);
+        if (inside[tag + 1] == '/') {
+            --depth;
+            continue;
+        }
+        if (depth == 1) names.push_back(inside.substr(tag + 1, inside.find_first_of(" />", tag + 1) - tag - 1));
+        if (inside[end - 1] != '/') ++depth;
+    }
+    return names;
+}
+
+}  // namespace test
+
+#endif
