@@ -20,7 +20,7 @@ namespace {
 
 struct GeolocateOptions {
     std::string header, direction, input = "-", output = "-", look;
-    double wavelength_m = 0.0, resample_s = 0.0;
+    std::optional<double> wavelength_m, resample_s;
     bool precise = false;
 };
 
@@ -218,29 +218,29 @@ int geolocate(const GeolocateOptions& options) {
     const Direction& direction = direction_of(options);
     note_interrupts();
     Scene scene{options.header};
-    if (options.wavelength_m != 0.0) scene.use_wavelength(options.wavelength_m);
+    if (options.wavelength_m) scene.use_wavelength(*options.wavelength_m);
     if (!options.look.empty()) scene.use_look_sign(options.look == "left" ? -1 : 1);
-    if (options.resample_s != 0.0) scene.resample(options.resample_s);
+    if (options.resample_s) scene.resample(*options.resample_s);
     warn_of_coarse_orbit(scene, scene.orbit());
     return geolocate_table(scene, options, direction);
 }
 
-constexpr const char* kAbout =
-    "Brings image samples to the ground (--to ground) or ground points to image samples (--to radar).\n"
-    "Reads and writes comma-separated values with a line of column names. Columns that are not needed are\n"
-    "passed through. Rows without a solution have a status other than 0 and empty values.\n"
-    "  ground: reads azimuth_time_s, range_time_s and, if there, doppler_hz; adds x_m, y_m, z_m,\n"
-    "          latitude_deg, longitude_deg, incidence_deg, look_deg, fm_rate_hz_s, speed_m_s, status\n"
+constexpr const char* kAbout = "Brings image samples to the ground, or ground points to image samples";
+constexpr const char* kDetails =
+    "Reads and writes comma-separated values with a line of column names; columns that are not needed are passed\n"
+    "through. A row without a solution gets a status other than 0 and empty values.\n"
+    "  ground: reads azimuth_time_s, range_time_s and, if there, doppler_hz; adds x_m, y_m, z_m, latitude_deg,\n"
+    "          longitude_deg, incidence_deg, look_deg, fm_rate_hz_s, speed_m_s, status\n"
     "  radar:  reads latitude_deg, longitude_deg, height_m and, if there, doppler_hz; adds azimuth_time_s,\n"
     "          range_time_s, status\n"
-    "Points of --to ground lie on the WGS84 ellipsoid. A computed column whose name is taken gets the\n"
-    "prefix computed_.";
+    "Points of --to ground lie on the WGS84 ellipsoid. A computed column whose name is taken gets the prefix\n"
+    "computed_.";
 
 }  // namespace
 
 void add_geolocate(CLI::App& app, Job& job) {
     auto options = std::make_shared<GeolocateOptions>();
-    CLI::App* command = app.add_subcommand("geolocate", kAbout);
+    CLI::App* command = app.add_subcommand("geolocate", kAbout)->footer(kDetails);
     command->add_option("HEADER", options->header, "Product header with the orbit")->required();
     command->add_option("--to", options->direction, "Which way")
         ->required()

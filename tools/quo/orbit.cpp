@@ -1,5 +1,6 @@
 #include <memory>
 #include <nlohmann/json.hpp>
+#include <optional>
 
 #include "commands.h"
 #include "date.h"
@@ -14,7 +15,7 @@ namespace {
 struct OrbitOptions {
     std::string header;
     std::vector<std::string> at;
-    double every_s = 0.0;
+    std::optional<double> every_s;
     bool json = false;
 };
 
@@ -25,6 +26,17 @@ struct StateVector {
     const char* direction() const { return velocity_m_s[2] > 0.0 ? "ascending" : "descending"; }
     std::string date() const { return date_text(time_s).value_or("-"); }
 };
+
+/** The times from the first state vector to the last, `step_s` apart. */
+void append_steps(std::vector<double>& times, const Scene& scene, double step_s) {
+    constexpr double kMostSteps = 1e7;
+    constexpr double kLeeway =
+        1e-9;  // of a step: the last vector is one of the times where the step divides the span
+    const double steps = (scene.last_time() - scene.first_time()) / step_s;
+    if (!(step_s > 0.0 && steps <= kMostSteps)) throw WrongUse("--every " + exact(step_s));
+    const auto last = static_cast<std::int64_t>(steps + kLeeway);
+    for (std::int64_t i = 0; i <= last; ++i) times.push_back(scene.first_time() + static_cast<double>(i) * step_s);
+}
 
 /** The times that the options ask for. Those outside the state vectors, where the orbit would be extrapolated, are
  * left out with a message; `outside` counts them. */
@@ -40,15 +52,7 @@ std::vector<double> times_asked_for(const OrbitOptions& options, const Scene& sc
         complain(scene.name() + ": " + text + " lies outside the state vectors, " + exact(scene.first_time()) +
                  " to " + exact(scene.last_time()));
     }
-    if (options.every_s != 0.0) {
-        const double span_s = scene.last_time() - scene.first_time();
-        constexpr double kMost = 1e7;
-        if (!(options.every_s > 0.0) || span_s / options.every_s > kMost)
-            throw WrongUse("--every " + exact(options.every_s));
-        const auto last = static_cast<std::int64_t>(span_s / options.every_s + 1e-9);
-        for (std::int64_t i = 0; i <= last; ++i)
-            times.push_back(scene.first_time() + static_cast<double>(i) * options.every_s);
-    }
+    if (options.every_s) append_steps(times, scene, *options.every_s);
     return times;
 }
 
@@ -106,7 +110,7 @@ std::string as_text(Scene& scene, const std::vector<std::string>& findings) {
         {"look side", !scene.look_sign()       ? "not in the header"
                       : *scene.look_sign() < 0 ? "left"
                                                : "right"},
-        {"model error", fixed(orbit.orbitFitError() * 1e3, 4) + " mm at most"},
+        {"model error", fixed(orbit.orbitFitError() * 1e3, 4) + " mm (estimate)"},
     };
     if (findings.empty()) facts.emplace_back("findings", "none");
     for (const std::string& finding : findings) facts.emplace_back("finding", finding);

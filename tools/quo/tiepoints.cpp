@@ -221,17 +221,18 @@ int check_tiepoints(const TiepointsOptions& options) {
     return all_solved ? kFine : kFindings;
 }
 
-constexpr const char* kAbout =
-    "Compares a header's geometry with tie points: ground points whose image time and range are known from\n"
-    "elsewhere. Azimuth time and slant range are found from the ground point, ground position and incidence\n"
-    "from time and range at the point's height. Reads azimuth_time_s, range_time_s, latitude_deg,\n"
-    "longitude_deg, height_m and incidence_deg from SCENE_tie_points.csv beside SCENE.xml.";
+constexpr const char* kAbout = "Compares a header's geometry with points known from elsewhere";
+constexpr const char* kDetails =
+    "Tie points are ground points whose azimuth time and range time are known. Azimuth time and slant range are\n"
+    "found from the ground point, ground position and incidence angle from the times and the point's height.\n"
+    "Reads azimuth_time_s, range_time_s, latitude_deg, longitude_deg, height_m and incidence_deg from\n"
+    "SCENE_tie_points.csv beside SCENE.xml.";
 
 }  // namespace
 
 void add_tiepoints(CLI::App& app, Job& job) {
     auto options = std::make_shared<TiepointsOptions>();
-    CLI::App* command = app.add_subcommand("tiepoints", kAbout);
+    CLI::App* command = app.add_subcommand("tiepoints", kAbout)->footer(kDetails);
     command->add_option("HEADER", options->headers, "Product headers")->required();
     command->add_option("--points", options->points, "Tie points of the one header given");
     command

@@ -1,0 +1,150 @@
+#include <gmock/gmock.h>
+
+#include "tool.h"
+
+namespace {
+
+using test::quo;
+using test::scene_file;
+using testing::HasSubstr;
+using testing::StartsWith;
+
+const std::string kHeader = scene_file("s1a_iw1_slc_20220104_asc");
+
+TEST(CommandLine, HelpNamesEverySubcommand) {
+    const auto help = quo({"--help"});
+    EXPECT_EQ(help.exit_status, 0);
+    for (const char* subcommand : {"geolocate", "orbit", "time", "tiepoints"}) {
+        EXPECT_THAT(help.out, HasSubstr(subcommand));
+        EXPECT_EQ(quo({subcommand, "--help"}).exit_status, 0);
+    }
+}
+
+TEST(CommandLine, TellsItsVersion) {
+    const auto version = quo({"--version"});
+    EXPECT_EQ(version.exit_status, 0);
+    EXPECT_EQ(version.out, "quo " QUO_VERSION "\n");
+}
+
+struct Refusal {
+    const char* name;
+    std::vector<std::string> arguments;
+};
+const Refusal kWrongUses[] = {
+    {"NoSubcommand", {}},
+    {"UnknownSubcommand", {"geocode"}},
+    {"UnknownOption", {"orbit", kHeader, "--loud"}},
+    {"NoHeader", {"geolocate", "--to", "ground"}},
+    {"NoDirection", {"geolocate", kHeader}},
+    {"UnknownDirection", {"geolocate", kHeader, "--to", "moon"}},
+    {"PreciseToTheGround", {"geolocate", kHeader, "--to", "ground", "--precise"}},
+    {"UnknownSide", {"geolocate", kHeader, "--to", "ground", "--look", "up"}},
+    {"NegativeWavelength", {"geolocate", kHeader, "--to", "ground", "--wavelength", "-0.05"}},
+    {"WavelengthInWords", {"geolocate", kHeader, "--to", "ground", "--wavelength", "C"}},
+    {"WavelengthNotANumber", {"geolocate", kHeader, "--to", "ground", "--wavelength", "nan"}},
+    {"ZeroWavelength", {"geolocate", kHeader, "--to", "ground", "--wavelength", "0"}},
+    {"NegativeSpacing", {"geolocate", kHeader, "--to", "ground", "--resample", "-10"}},
+    {"ZeroStep", {"orbit", kHeader, "--every", "0"}},
+    {"NegativeStep", {"orbit", kHeader, "--every", "-1"}},
+    {"StepTooSmall", {"orbit", kHeader, "--every", "1e-9"}},
+    {"TimeAndStep", {"orbit", kHeader, "--at", "1167930300", "--every", "1"}},
+    {"TimeOfOrbitInWords", {"orbit", kHeader, "--at", "noon"}},
+    {"NoTime", {"time"}},
+    {"TimeInWords", {"time", "yesterday"}},
+    {"UnknownMonth", {"time", "04-XYZ-2022"}},
+    {"PointsForTwoHeaders", {"tiepoints", kHeader, kHeader, "--points", "x.csv"}},
+};
+
+class WrongUse : public testing::TestWithParam<Refusal> {};
+
+TEST_P(WrongUse, IsRefusedInOneLineWithStatusTwo) {
+    const auto refused = quo(GetParam().arguments, "azimuth_time_s,range_time_s\n");
+    EXPECT_EQ(refused.exit_status, 2);
+    EXPECT_EQ(refused.out, "");
+    ASSERT_EQ(refused.messages().size(), 1U) << refused.err;
+    EXPECT_THAT(refused.err, StartsWith("quo: "));
+}
+INSTANTIATE_TEST_SUITE_P(CommandLine, WrongUse, testing::ValuesIn(kWrongUses),
+                         [](const auto& row) { return row.param.name; });
+
+struct FailedJob {
+    const char* name;
+    std::string header, table, cause;  // an empty table: the job is `orbit`
+    std::vector<std::string> options = {};
+};
+
+class Failing : public testing::TestWithParam<FailedJob> {
+protected:
+    static std::string made(const test::MadeHeader& about) {
+        return header_of(test::CircularOrbit{41.3, 12.8, -12.7}, about);
+    }
+};
+
+const std::string kTable = "azimuth_time_s,range_time_s\n1167930310.25,0.0056\n";
+const std::string kFiveVectors = header_of(test::CircularOrbit{41.3, 12.8, -12.7}, {.vectors = 5});
+
+std::string without(std::string text, const std::string& part) {
+    return text.erase(text.find(part), part.size());
+}
+
+const FailedJob kFailedJobs[] = {
+    {"EmptyHeader", " ", "", "no state vectors"},
+    {"HeaderInWords", "not a header", "", "no state vectors"},
+    {"HeaderCutShort", kFiveVectors.substr(0, kFiveVectors.size() / 2), "", "no state vectors"},
+    {"NoCountOfVectors", without(kFiveVectors, "<nSV_n>5</nSV_n>"), "", "no state vectors"},
+    {"FourVectors", header_of(test::CircularOrbit{41.3, 12.8, -12.7}, {.vectors = 4}), "", "at least 5"},
+    {"NoSpacing", header_of(test::CircularOrbit{41.3, 12.8, -12.7}, {.spacing_s = 0.0}), "", "spacing"},
+    {"NoWavelength", header_of(test::CircularOrbit{41.3, 12.8, -12.7}, {.wavelength_m = ""}), kTable,
+     "--wavelength"},
+    {"UnknownWavelength", header_of(test::CircularOrbit{41.3, 12.8, -12.7}, {.wavelength_m = "-999"}), kTable,
+     "--wavelength"},
+    {"NoLookSide", header_of(test::CircularOrbit{41.3, 12.8, -12.7}, {.look_direction = ""}), kTable, "--look"},
+    {"EmptyTable", kFiveVectors, "\n\n", "no line of column names"},
+    {"OnlyComments", kFiveVectors, "# a\n# b", "no line of column names"},
+    {"MissingColumn", kFiveVectors, "azimuth_time_s,range_s\n1,2\n", "no column range_time_s"},
+    {"ColumnTwice", kFiveVectors, "azimuth_time_s,range_time_s,range_time_s\n1,2,3\n", "two columns"},
+    {"OpenQuoteInTheHeading", kFiveVectors, "azimuth_time_s,\"range_time_s\n1,2\n", "quote"},
+    {"EndlessLine", kFiveVectors, kTable + std::string(2'000'000, '7') + "\n", "longer than 1 MiB"},
+};
+
+// A guess in place of what is missing, here above all wavelength and look side, would give plausible wrong
+// numbers.
+TEST_P(Failing, NamesFileAndCauseInOneLineWithStatusOne) {
+    const FailedJob& job = GetParam();
+    const test::TemporaryFolder folder;
+    const std::string header = folder.file("header.xml");
+    const std::string table = folder.file("table.csv");
+    test::write_text(header, job.header);
+    test::write_text(table, job.table);
+    const auto failed = job.table.empty() ? quo({"orbit", header})
+                                          : quo({"geolocate", header, "--to", "ground", "--input", table,
+                                                 "--output", folder.file("result.csv")});
+    EXPECT_EQ(failed.exit_status, 1);
+    ASSERT_EQ(failed.messages().size(), 1U) << failed.err;
+    EXPECT_THAT(failed.err, HasSubstr(job.cause));
+    EXPECT_THAT(failed.err, testing::ContainsRegex("(header.xml|table.csv): "));
+    EXPECT_FALSE(std::filesystem::exists(folder.file("result.csv")));
+}
+INSTANTIATE_TEST_SUITE_P(CommandLine, Failing, testing::ValuesIn(kFailedJobs),
+                         [](const auto& row) { return row.param.name; });
+
+TEST(CommandLine, NamesFilesThatCannotBeOpened) {
+    const test::TemporaryFolder folder;
+    const std::string missing = folder.file("missing");
+    EXPECT_EQ(quo({"orbit", missing}).err, "quo: " + missing + ": No such file or directory\n");
+    EXPECT_EQ(quo({"orbit", folder.path()}).err, "quo: " + folder.path().string() + ": not a regular file\n");
+    const auto no_input = quo({"geolocate", kHeader, "--to", "ground", "--input", missing});
+    EXPECT_EQ(no_input.exit_status, 1);
+    EXPECT_EQ(no_input.err, "quo: " + missing + ": No such file or directory\n");
+    const std::string unreachable = folder.file("no/such/folder");
+    const auto no_output = quo({"geolocate", kHeader, "--to", "ground", "--output", unreachable}, kTable);
+    EXPECT_EQ(no_output.exit_status, 1);
+    EXPECT_EQ(no_output.err, "quo: " + unreachable + ": No such file or directory\n");
+}
+
+// A file name is data: line feeds and terminal codes in it must not forge lines of their own.
+TEST(CommandLine, KeepsControlCharactersOutOfItsMessages) {
+    EXPECT_EQ(quo({"orbit", "a\nquo: b\033[2J"}).err, "quo: a quo: b [2J: No such file or directory\n");
+}
+
+}  // namespace
