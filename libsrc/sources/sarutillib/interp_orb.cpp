@@ -144,7 +144,7 @@ bool fit_near(GramFit fit, const Nodes& nodes, const double* values, double roun
     for (;; fit.advance()) {
         const Stored c = expanded(fit, nodes);
         const double distance = misfit(c, fit.degree(), nodes, values);
-        if (!(distance <= kHopeless * (best + rounding))) break;
+        if (!std::isfinite(distance) || distance > kHopeless * (best + rounding)) break;
         best = std::min(best, distance);
         if (distance <= 2.0 * best + rounding) {
             *kept = c;

@@ -1,0 +1,102 @@
+#include "sarutillib/geometry_kernels.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+
+#include "support/geometry.h"
+
+namespace {
+
+using quo::Ellipsoid;
+using quo::Vec3;
+
+test::Vec3 plain(const Vec3& p) { return {p.x, p.y, p.z}; }
+
+TEST(Geodetic, ReturnsFromEveryPlaceAndHeight) {
+    constexpr Ellipsoid kBodies[] = {quo::kWgs84, {6371000.3, 6371000.3}, {3396190.0, 3376200.0}, {6.3e6, 6.4e6}};
+    for (const Ellipsoid& body : kBodies)
+        for (const double latitude : {-90.0, -89.9999999, -45.3, -1e-7, 0.0, 17.3, 44.9, 89.93, 90.0})
+            for (const double longitude : {-179.9999999, -90.0, 0.0, 12.8, 101.4, 180.0})
+                for (const double height : {-9517.3, 0.0, 8848.1, 693e3, 36e6}) {
+                    SCOPED_TRACE(testing::Message() << latitude << " " << longitude << " " << height);
+                    const test::Vec3 p =
+                        test::geodetic_point(latitude, longitude, height, body.equatorial_m, body.polar_m);
+                    const auto g = quo::to_geodetic(quo::load(p.v), body);
+                    const double rounding = 4e-16 * test::norm(p);
+                    EXPECT_NEAR(g.height_m, height, 2.0 * rounding);
+                    EXPECT_LT(test::norm(test::geodetic_point(g.latitude_deg, g.longitude_deg, g.height_m,
+                                                              body.equatorial_m, body.polar_m) -
+                                         p),
+                              3.0 * rounding);
+                    EXPECT_LT(test::norm(plain(quo::from_geodetic(g, body)) - p), 3.0 * rounding);
+                }
+}
+
+TEST(Geodetic, HasAnAnswerOnTheAxisAndAtTheCentre) {
+    for (const double z : {test::kSemiMinor, -test::kSemiMinor}) {
+        const auto pole = quo::to_geodetic({0.0, 0.0, z}, quo::kWgs84);
+        EXPECT_EQ(pole.latitude_deg, std::copysign(90.0, z));
+        EXPECT_EQ(pole.longitude_deg, 0.0);
+        EXPECT_NEAR(pole.height_m, 0.0, 1e-9);
+    }
+    const auto centre = quo::to_geodetic({0.0, 0.0, 0.0}, quo::kWgs84);
+    EXPECT_TRUE(std::isfinite(centre.latitude_deg) && std::isfinite(centre.height_m));
+}
+
+/** A look at the WGS84 ellipsoid from a circular orbit. */
+struct View {
+    test::Platform sat;
+    quo::RadarLook look;
+    Vec3 S, V, P{};
+    explicit View(double range, double fd = 0.0, double side = 1.0)
+        : sat{test::circular_orbit(41.3, 12.8, -12.7)},
+          look{2.0 * range / test::kLightSpeed, fd, 0.0555, side},
+          S{quo::load(sat.position.v)},
+          V{quo::load(sat.velocity.v)} {
+        EXPECT_EQ(quo::ground_point(S, V, look, quo::kWgs84, &P), 0);
+    }
+};
+
+// The slow search decides near the nadir; everywhere else it has to come to the same place as the fast one.
+TEST(GroundPoint, IsTheSameBySearch) {
+    for (const double side : {+1.0, -1.0})
+        for (const double fd : {0.0, 7217.6})
+            for (const double range : {715e3, 803457.3, 1948730.1, 2800e3}) {
+                const View view{range, fd, side};
+                quo::LookCircle circle;
+                quo::CirclePoint at;
+                ASSERT_EQ(quo::make_look_circle(view.S, view.V, view.look, quo::kWgs84, &circle), 0);
+                ASSERT_TRUE(quo::search_crossing(circle, &at));
+                const Vec3 p = view.S + (circle.along + at.c * circle.down + at.s * circle.across);
+                EXPECT_LT(quo::norm(p - view.P), 1e-6) << range << " " << fd << " " << side;
+            }
+}
+
+TEST(RefineGroundPoint, FindsTheSolutionFromAfar) {
+    for (const double omega : {0.0, test::kEarthRate})
+        for (const Vec3& away : {Vec3{31e3, -17e3, 23e3}, Vec3{-41.7, 3.9, 17.3}}) {
+            View view{848730.1, 3217.6};
+            // The inertial velocity of the same platform.
+            const Vec3 inertial = view.V + quo::cross({0.0, 0.0, omega}, view.S);
+            Vec3 p = view.P + away;
+            const int steps = quo::refine_ground_point(view.S, inertial, view.look, omega, quo::kWgs84, &p);
+            EXPECT_GE(steps, 2);
+            EXPECT_LE(steps, 7) << "quadratic convergence";
+            EXPECT_LT(quo::norm(p - view.P), 1e-7);
+        }
+}
+
+TEST(RefineGroundPoint, EndsWithoutASolutionToo) {
+    View view{848730.1};
+    quo::RadarLook beyond = view.look;
+    beyond.tau_s *= 0.5;  // shorter than the height
+    Vec3 p = view.P;
+    EXPECT_LE(quo::refine_ground_point(view.S, view.V, beyond, 0.0, quo::kWgs84, &p), quo::kForwardSteps);
+
+    p = view.S;  // no line of sight, no derivative: nowhere to step
+    EXPECT_EQ(quo::refine_ground_point(view.S, view.V, view.look, 0.0, quo::kWgs84, &p), 0);
+    EXPECT_EQ(quo::norm(p - view.S), 0.0);
+}
+
+}  // namespace

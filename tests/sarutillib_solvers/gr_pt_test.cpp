@@ -1,0 +1,318 @@
+#include "quo_base/gr_pt.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <limits>
+#include <random>
+
+#include "support/diagnostics.h"
+#include "support/geometry.h"
+
+namespace {
+
+using test::circular_orbit;
+using test::CircularOrbit;
+using test::cross;
+using test::dot;
+using test::kEarthRate;
+using test::kLightSpeed;
+using test::kSemiMajor;
+using test::kSemiMinor;
+using test::norm;
+using test::Platform;
+using test::Vec3;
+
+constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
+constexpr double kInfinity = std::numeric_limits<double>::infinity();
+
+/** The inputs of the solvers, to be varied one by one. */
+struct Request {
+    Vec3 S, V;
+    double tau, fd = 0.0, lambda = 0.05546576, omega = 0.0, side = 1.0, a = kSemiMajor, b = kSemiMinor;
+
+    Request(const Platform& sat, double range)
+        : S{sat.position}, V{sat.velocity}, tau{2.0 * range / kLightSpeed} {}
+    int gr_pt(Vec3& P) const { return ::gr_pt(P.v, S.v, V.v, tau, fd, lambda, omega, side, a, b); }
+    int gr_pt0(Vec3& P) const { return ::gr_pt0(P.v, S.v, V.v, tau, fd, lambda, omega, side, a, b); }
+};
+
+/** The defining equations, written independently of the solver: a one-way range time, a swapped look side, a wrong
+ * Doppler sign, a sphere for the ellipsoid each break one of them. Rounding grows with the numbers' size. */
+void expect_solution(const Request& look, const Vec3& P) {
+    const double rounding = 1e-15 * norm(look.S) + 1e-9;
+    const Vec3 line = P - look.S;
+    const Vec3 relative = look.V - cross({0.0, 0.0, look.omega}, P);  // against the ground at P
+    EXPECT_NEAR(norm(line), look.tau * kLightSpeed / 2.0, rounding);
+    EXPECT_NEAR(dot(relative, line) / norm(line), 0.5 * look.lambda * look.fd, 1e-10 + 1e-15 * norm(look.V));
+    EXPECT_NEAR(test::height_above_ellipsoid(P, look.a, look.b), 0.0, rounding);
+    EXPECT_GT((look.side < 0.0 ? -1.0 : 1.0) * dot(cross(relative, look.S), line), 0.0);
+    EXPECT_GT(dot(test::ellipsoid_gradient(P, look.a, look.b), -line), 0.0) << "beyond the horizon";
+}
+
+struct Look {
+    const char* name;
+    double latitude, longitude, heading, height_m, range_m, doppler_hz, lambda_m, side;
+};
+constexpr Look kLooks[] = {
+    {"RightAscendingNearRange", 41.3, 12.8, -12.7, 693e3, 803457.3, 0.0, 0.0555, +1.0},
+    {"LeftDescendingFarRange", -23.9, 101.4, -167.3, 693e3, 951218.9, 0.0, 0.0555, -1.0},
+    {"RightSquintedForward", 41.3, 12.8, -12.7, 693e3, 848730.1, +3217.6, 0.0555, +1.0},
+    {"LeftSquintedBackward", 8.1, -77.7, -167.3, 693e3, 1048730.1, -19876.5, 0.031, -1.0},
+    {"SquintedFarAtLongWave", 8.1, -77.7, 12.3, 693e3, 1148730.1, +19876.5, 0.2384, +1.0},
+    {"ZeroSignLooksRight", 41.3, 12.8, 167.3, 514e3, 603457.3, 111.7, 0.031, 0.0},
+    {"OverTheNorthPole", 89.97, 33.0, 91.7, 627e3, 703457.3, -517.3, 0.0555, +1.0},
+    {"OverTheSouthPole", -90.0, 0.0, 17.3, 627e3, 703457.3, 0.0, 0.0555, -1.0},
+    {"AcrossTheAntimeridian", 12.1, 179.3, -12.7, 786e3, 953457.3, 217.3, 0.0555, +1.0},
+    {"AcrossItTheOtherWay", 12.1, -179.3, -12.7, 786e3, 953457.3, 217.3, 0.0555, -1.0},
+    {"JustOffNadir", 47.3, 12.8, -12.7, 693e3, 704957.3, 0.0, 0.0555, -1.0},
+    {"LowOrbitNearTheHorizon", 3.7, 12.8, 97.3, 203e3, 1490000.0, 0.0, 0.0555, +1.0},
+    {"GeosynchronousInclined", 17.3, 12.8, -31.7, 35786e3, 37203457.3, 73.1, 0.2384, -1.0},
+    {"Airborne", 49.5, -97.7, -44.0, 12517.0, 17345.6, 31.7, 0.2412, -1.0},
+};
+class GrPt : public testing::TestWithParam<Look> {
+protected:
+    static Request request(const Platform& sat) {
+        Request look{sat, GetParam().range_m};
+        look.fd = GetParam().doppler_hz;
+        look.lambda = GetParam().lambda_m;
+        look.side = GetParam().side;
+        return look;
+    }
+    static Platform platform(bool inertial) {
+        const Look& at = GetParam();
+        const CircularOrbit orbit{at.latitude, at.longitude, at.heading, at.height_m};
+        Platform sat = inertial ? orbit.inertial(0.0) : orbit.earth_fixed(0.0);
+        if (at.height_m < 100e3) {  // an aircraft
+            sat.velocity = 231.7 / norm(sat.velocity) * sat.velocity;
+            if (inertial) sat.velocity = sat.velocity + cross({0.0, 0.0, kEarthRate}, sat.position);
+            // Heights over the ellipsoid, where the orbits' are over the equator's radius.
+            sat.position = test::geodetic_point(at.latitude, at.longitude, at.height_m);
+        }
+        return sat;
+    }
+};
+
+TEST_P(GrPt, MeetsRangeDopplerEllipsoidAndSide) {
+    const Request look = request(platform(false));
+    Vec3 P{}, start{};
+    ASSERT_EQ(look.gr_pt(P), 0);
+    expect_solution(look, P);
+    ASSERT_EQ(look.gr_pt0(start), 0);
+    EXPECT_LT(norm(start - P), 1e-3);
+}
+
+TEST_P(GrPt, MeetsThemForAnInertialVelocityToo) {
+    Request look = request(platform(true));
+    look.omega = kEarthRate;
+    Vec3 P{}, start{};
+    ASSERT_EQ(look.gr_pt(P), 0);
+    expect_solution(look, P);
+    ASSERT_EQ(look.gr_pt0(start), 0);
+    EXPECT_LT(norm(start - P), 1e-3);
+}
+INSTANTIATE_TEST_SUITE_P(Looks, GrPt, testing::ValuesIn(kLooks), [](const auto& row) { return row.param.name; });
+
+TEST(GrPtInertial, FindsThePointOfTheEarthFixedState) {
+    const CircularOrbit orbit{41.3, 12.8, -12.7};
+    Request fixed{orbit.earth_fixed(0.0), 848730.1}, inertial{orbit.inertial(0.0), 848730.1};
+    fixed.fd = inertial.fd = 3217.6;
+    inertial.omega = kEarthRate;
+    Vec3 P{}, Q{};
+    ASSERT_EQ(fixed.gr_pt(P), 0);
+    ASSERT_EQ(inertial.gr_pt(Q), 0);
+    EXPECT_LT(norm(P - Q), 1e-7);
+}
+
+/** Where a ray from a satellite meets the WGS84 ellipsoid first, as the distance; NaN where it passes by. */
+double ray_range(const Vec3& from, const Vec3& direction) {
+    const Vec3 weights{1.0 / (kSemiMajor * kSemiMajor), 1.0 / (kSemiMajor * kSemiMajor),
+                       1.0 / (kSemiMinor * kSemiMinor)};
+    const auto product = [&](const Vec3& p, const Vec3& q) {
+        return dot({weights[0] * p[0], weights[1] * p[1], weights[2] * p[2]}, q);
+    };
+    const double A = product(direction, direction), B = product(from, direction), C = product(from, from) - 1.0;
+    return C / (-B + std::sqrt(B * B - A * C));
+}
+
+// Truth by looking: a ray meets the ground, and range, Doppler and side of that place must lead back to it.
+TEST(GrPtSwept, FindsWhateverARayMeets) {
+    std::mt19937_64 random{20260117};
+    const auto between = [&](double low, double high) {
+        return std::uniform_real_distribution<>{low, high}(random);
+    };
+    constexpr double kLambdas[] = {0.0311, 0.0555, 0.2384};
+    int solved = 0;
+    while (solved < 20000) {
+        const double height = 200e3 * std::pow(180.0, between(0.0, 1.0));
+        const Platform sat =
+            circular_orbit(between(-90.0, 90.0), between(-180.0, 180.0), between(-180.0, 180.0), height);
+        const Vec3 ahead = test::unit(sat.velocity), right = test::unit(cross(ahead, sat.position));
+        const double horizon = std::asin(kSemiMinor / norm(sat.position));
+        const double off_nadir = between(0.02, 0.995) * horizon, around = between(-1.4, 1.4);
+        const double side = solved % 2 == 0 ? 1.0 : -1.0;
+        const Vec3 ray = std::sin(off_nadir) * (std::cos(around) * side * right + std::sin(around) * ahead) -
+                         std::cos(off_nadir) * test::unit(sat.position);
+        Request look{sat, ray_range(sat.position, ray)};
+        look.side = side;
+        look.lambda = kLambdas[solved % 3];
+        look.fd = 2.0 / look.lambda * dot(sat.velocity, ray);
+        // A platform nearly at rest over the ground has no Doppler to tell places apart.
+        if (!std::isfinite(look.tau) || std::abs(look.fd) > 20e3 || norm(sat.velocity) < 300.0) continue;
+        ++solved;
+        Vec3 P{}, start{};
+        ASSERT_EQ(look.gr_pt(P), 0) << "height " << height << " side " << side << " fd " << look.fd;
+        ASSERT_EQ(look.gr_pt0(start), 0);
+        const Vec3 seen = sat.position + look.tau * kLightSpeed / 2.0 * ray;
+        ASSERT_LT(norm(P - seen), 1e-4) << "height " << height << " side " << side << " fd " << look.fd;
+        ASSERT_LT(norm(start - P), 1e-3);
+    }
+}
+
+// The shortest and the longest range at which the zero-Doppler plane meets the ground, found by sweeping rays in
+// it: solved up to either, and refused beyond.
+TEST(GrPtSwept, EndsAtTheHeightAndAtTheHorizon) {
+    for (const double side : {+1.0, -1.0})
+        for (const double latitude : {-71.3, 0.0, 44.7}) {
+            SCOPED_TRACE(testing::Message() << "latitude " << latitude << " side " << side);
+            const Platform sat = circular_orbit(latitude, 12.8, -12.7);
+            const Vec3 across = side * test::unit(cross(sat.velocity, sat.position));
+            const Vec3 down = -test::unit(cross(cross(sat.velocity, sat.position), sat.velocity));
+            const auto range_at = [&](double angle) {
+                return ray_range(sat.position, std::cos(angle) * down + std::sin(angle) * across);
+            };
+            double shortest = kInfinity, inside = 0.5, outside = 1.5;
+            for (double angle = 0.0; angle < 0.02; angle += 1e-6) shortest = std::min(shortest, range_at(angle));
+            while (outside - inside > 1e-15) {
+                const double middle = 0.5 * (inside + outside);
+                (std::isnan(range_at(middle)) ? outside : inside) = middle;
+            }
+            const double longest = range_at(inside);
+            Vec3 P{};
+            for (const double range : {shortest + 0.001, shortest + 1.7, longest - 100.7, longest - 0.7}) {
+                Request sided{sat, range};
+                sided.side = side;
+                ASSERT_EQ(sided.gr_pt(P), 0) << range;
+                expect_solution(sided, P);
+            }
+            for (const double range :
+                 {17.3, shortest / 2.0, shortest - 0.001, longest + 0.7, longest + 1e6, 3e7}) {
+                Request sided{sat, range};
+                sided.side = side;
+                EXPECT_EQ(sided.gr_pt(P), 10) << range;
+            }
+        }
+}
+
+struct Fault {
+    const char* name;
+    int status;
+    void (*apply)(Request&);
+};
+constexpr Fault kFaults[] = {
+    {"RangeShorterThanTheHeight", 10, [](Request& r) { r.tau *= 0.3; }},
+    {"BeyondTheHorizon", 10, [](Request& r) { r.tau *= 4.0; }},
+    {"DopplerBeyondTheVelocity", 10, [](Request& r) { r.fd = 2.1 * norm(r.V) / r.lambda; }},
+    {"FlightStraightDown", 10, [](Request& r) { r.V = -1.1e-3 * r.S; }},
+    {"PlatformBelowTheGround", 10, [](Request& r) { r.S = 0.3 * r.S; }},
+    {"PlatformAtTheCentre", 10, [](Request& r) { r.S = {}; }},
+    {"ZeroVelocity", 1, [](Request& r) { r.V = {}; }},
+    {"ZeroRange", 1, [](Request& r) { r.tau = 0.0; }},
+    {"NegativeRange", 1, [](Request& r) { r.tau = -r.tau; }},
+    {"ZeroWavelength", 1, [](Request& r) { r.lambda = 0.0; }},
+    {"ZeroSemiAxis", 1, [](Request& r) { r.b = 0.0; }},
+};
+
+TEST(GrPtFaults, GiveAStatusAndNoPoint) {
+    for (const Fault& fault : kFaults) {
+        SCOPED_TRACE(fault.name);
+        const test::Report report;
+        Request look{circular_orbit(41.3, 12.8, -12.7), 848730.1};
+        fault.apply(look);
+        Vec3 P{17.3, 18.3, 19.3};
+        EXPECT_EQ(look.gr_pt0(P), fault.status);
+        EXPECT_EQ(look.gr_pt(P), fault.status);
+        EXPECT_EQ(P[0] + P[1] + P[2], 17.3 + 18.3 + 19.3);
+
+        const auto entries = report.entries("ERROR");
+        ASSERT_EQ(entries.size(), 2U) << "one of either call";
+        EXPECT_EQ(entries[1].function, "gr_pt0");
+        const auto tree = report.entries("ERROR_CALL_TREE");
+        ASSERT_EQ(tree.size(), 1U);
+        EXPECT_EQ(tree[0].function, "gr_pt");
+    }
+}
+
+TEST(GrPtFaults, NoInputThatIsNotFiniteGivesAPoint) {
+    double Request::*const kMembers[] = {&Request::tau,  &Request::fd, &Request::lambda, &Request::omega,
+                                         &Request::side, &Request::a,  &Request::b};
+    const Request good{circular_orbit(41.3, 12.8, -12.7), 848730.1};
+    for (const double bad : {kNaN, kInfinity, -kInfinity, 1e200, -1e200, 1e-320}) {
+        const auto refuse = [&](const Request& look) {
+            Vec3 P{17.3, 18.3, 19.3};
+            const int status = look.gr_pt(P);
+            if (std::isfinite(bad) && status == 0)
+                expect_solution(look, P);
+            else
+                EXPECT_TRUE((status == 1 || status == 10) && P[0] == 17.3) << bad << " gives " << status;
+        };
+        for (const auto member : kMembers) {
+            Request look = good;
+            look.*member = bad;
+            if (member != &Request::side || !std::isfinite(bad)) refuse(look);
+        }
+        for (std::size_t axis = 0; axis < 3; ++axis) {
+            Request look = good;
+            look.S[axis] = bad;
+            if (std::abs(bad) > 1.0 || std::isnan(bad)) refuse(look);
+            look = good;
+            look.V[axis] = bad;
+            if (std::abs(bad) > 1.0 || std::isnan(bad)) refuse(look);
+        }
+    }
+}
+
+// At this size one unit in the last place is longer than the step at which the iteration is done.
+TEST(GrPt, EndsWhereNoStepIsShortEnough) {
+    constexpr double kScale = 1e9;
+    for (const double omega : {0.0, kEarthRate}) {
+        Request look{circular_orbit(41.3, 12.8, -12.7), kScale * 848730.1};
+        look.S = kScale * look.S;
+        look.V = kScale * look.V;
+        look.omega = omega;
+        look.lambda = kScale * look.lambda;
+        look.a *= kScale;
+        look.b *= kScale;
+        Vec3 P{};
+        ASSERT_EQ(look.gr_pt(P), 0);
+        EXPECT_NEAR(norm(P - look.S) / (kScale * 848730.1), 1.0, 1e-14);
+        EXPECT_NEAR(dot(test::ellipsoid_gradient(P, look.a, look.b), P), 1.0, 1e-14);
+    }
+}
+
+TEST(MakeVersor, HasUnitLengthOrIsZero) {
+    double v[3] = {17.3, -4.1, 2.9}, r[3];
+    make_versor(v, r);
+    EXPECT_NEAR(norm({r[0], r[1], r[2]}), 1.0, 1e-15);
+    EXPECT_NEAR(r[1] / r[0], -4.1 / 17.3, 1e-15);
+    EXPECT_GT(r[0], 0.0);
+    for (const double first : {0.0, kNaN}) {
+        double none[3] = {first, 0.0, 0.0};
+        make_versor(none, none);
+        EXPECT_EQ(none[0], 0.0);
+        EXPECT_EQ(none[2], 0.0);
+    }
+}
+
+TEST(V1pv2, IsSquareToBothRightHandedAndMayOverwriteAnOperand) {
+    const double a[3] = {17.3, -4.1, 2.9};
+    double b[3] = {-0.7, 8.3, 5.9}, r[3];
+    v1pv2(a, b, r);
+    EXPECT_NEAR(a[0] * r[0] + a[1] * r[1] + a[2] * r[2], 0.0, 1e-12);
+    EXPECT_NEAR(b[0] * r[0] + b[1] * r[1] + b[2] * r[2], 0.0, 1e-12);
+    EXPECT_NEAR(r[2], 17.3 * 8.3 - 4.1 * 0.7, 1e-12);
+    v1pv2(a, b, b);
+    for (int i = 0; i < 3; ++i) EXPECT_EQ(b[i], r[i]);
+}
+
+}  // namespace

@@ -1,0 +1,171 @@
+#include "quo_base/interp_orb.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cmath>
+#include <limits>
+#include <vector>
+
+#include "orbit_fit.h"
+#include "support/diagnostics.h"
+#include "support/geometry.h"
+
+namespace {
+
+using test::CircularOrbit;
+using test::norm;
+using test::sampled;
+using test::Trajectory;
+using test::Vec3;
+
+/** Coefficients of (u + shift)^power, highest degree first. */
+std::vector<double> shifted_power(double shift, unsigned power) {
+    std::vector<double> c{1.0};
+    for (unsigned k = 0; k < power; ++k) {
+        c.push_back(0.0);
+        for (std::size_t i = c.size() - 1; i > 0; --i) c[i] += shift * c[i - 1];
+    }
+    return c;
+}
+
+TEST(OrbitPolynomial, ValueAndDerivativesAreThoseOfAShiftedPower) {
+    constexpr double u = 1.7, shift = 0.6;
+    for (unsigned power = 0; power < 9; ++power) {
+        const std::vector<double> c = shifted_power(shift, power);
+        const double p = power;
+        const auto term = [&](double exponent) { return exponent < 0.0 ? 0.0 : std::pow(u + shift, exponent); };
+        EXPECT_NEAR(POSMACRO(u, c.data(), power + 1), term(p), 1e-14 * term(p));
+        EXPECT_NEAR(VELMACRO(u, c.data(), power + 1), p * term(p - 1), 1e-13 * term(p));
+        EXPECT_NEAR(ACCMACRO(u, c.data(), power + 1), p * (p - 1) * term(p - 2), 1e-12 * term(p));
+        EXPECT_EQ(POSMACRO(0.0, c.data(), power + 1), c.back());
+    }
+}
+
+TEST(OrbitPolynomial, OfNoCoefficientsIsZeroAndReadsNothing) {
+    EXPECT_EQ(POSMACRO(17.3, nullptr, 0), 0.0);
+    EXPECT_EQ(VELMACRO(17.3, nullptr, 0), 0.0);
+    EXPECT_EQ(ACCMACRO(17.3, nullptr, 0), 0.0);
+}
+
+TEST(OrbitPolynomial, OfThreeAxesIsThatOfEach) {
+    const std::vector<double> c[3] = {shifted_power(0.6, 4), shifted_power(-1.1, 4), shifted_power(2.3, 4)};
+    double position[3], velocity[3], acceleration[3];
+    POSVELACC_5(1.7, c[0].data(), c[1].data(), c[2].data(), position, velocity, acceleration);
+    for (std::size_t axis = 0; axis < 3; ++axis) {
+        const double base = 1.7 + (axis == 0 ? 0.6 : axis == 1 ? -1.1 : 2.3);
+        EXPECT_NEAR(position[axis], std::pow(base, 4), 1e-12);
+        EXPECT_NEAR(velocity[axis], 4.0 * std::pow(base, 3), 1e-12);
+        EXPECT_NEAR(acceleration[axis], 12.0 * std::pow(base, 2), 1e-12);
+    }
+}
+
+/** A pass over the pole whose positions hold as many decimals as product headers do, where `decimals` is set. */
+struct Pass {
+    int n;
+    double t0, dt;
+    bool decimals;
+    double at_vectors_m, between_m;
+};
+
+TEST(OrbInterp, PassesThroughTheVectorsAndFollowsTheOrbitBetween) {
+    const CircularOrbit orbit{77.3, 12.8, -12.7};
+    const Pass kPasses[] = {
+        {5, 0.0, 10.0, false, 4e-9, 3e-5},
+        {5, -13.7, 10.0, true, 4e-9, 3e-5},
+        {9, 0.0, 10.0, false, 4e-9, 1e-7},
+        {9, 7.3, 60.0, false, 4e-9, 1e-5},
+        {17, 0.0, 10.0, false, 4e-9, 1e-6},
+        {17, 0.0, 10.0, true, 4e-9, 3e-4},
+        {17, 0.0, 1.0, false, 4e-9, 1e-6},
+        {31, 0.0, 10.0, false, 2e-8, 1e-6},
+        // Here the one polynomial through all vectors would miss them by metres once it is evaluated.
+        {31, 0.0, 10.0, true, 2e-6, 1e-4},
+        {31, 0.0, 60.0, true, 2e-6, 1e-4},
+        {97, 0.0, 10.0, true, 2e-6, 1e-4},
+    };
+    for (const Pass& pass : kPasses) {
+        SCOPED_TRACE(testing::Message() << pass.n << " vectors " << pass.dt << " s apart");
+        auto positions = sampled(pass.n, 0.0, pass.dt, [&](double t) { return orbit.earth_fixed(t).position; });
+        if (pass.decimals)
+            for (double& value : positions) value = std::round(value * 1e6) / 1e6;
+        const Trajectory fit{pass.t0, pass.dt, positions};
+        ASSERT_EQ(fit.status, 0);
+        for (int i = 0; i < pass.n; ++i) {
+            const double t = i * pass.dt, half = t + 0.5 * pass.dt;
+            const auto* at = &positions[3 * static_cast<std::size_t>(i)];
+            EXPECT_LT(norm(fit.position(pass.t0 + t) - Vec3{at[0], at[1], at[2]}), pass.at_vectors_m) << i;
+            if (i + 1 == pass.n) break;
+            EXPECT_LT(norm(fit.position(pass.t0 + half) - orbit.earth_fixed(half).position), pass.between_m) << i;
+        }
+    }
+}
+
+TEST(OrbInterp, FindsTheCoefficientsOfAPolynomial) {
+    const double x[5] = {1.3e-4, -2.7e-3, -3.9, 7103.7, 803457.3};
+    const Trajectory fit{-7.3, 2.9, sampled(5, -7.3, 2.9, [&](double u) {
+                             return Vec3{POSMACRO(u, x, 5), 17.3, -3.1 * u};
+                         })};
+    ASSERT_EQ(fit.status, 0);
+    for (std::size_t i = 0; i < 5; ++i)
+        EXPECT_NEAR(fit.x[i], x[i], 1e-11 * std::pow(10.0, static_cast<double>(i)));
+    EXPECT_NEAR(fit.z[3], -3.1, 1e-12);
+    EXPECT_NEAR(fit.y[4], 17.3, 1e-12);
+
+    const Trajectory one{17.3, 0.0, {41.3, 12.8, -12.7}};
+    ASSERT_EQ(one.status, 0);
+    EXPECT_EQ(one.y[0], 12.8);
+}
+
+TEST(OrbInterp, RefusesWhatItCannotFit) {
+    const double nan = std::numeric_limits<double>::quiet_NaN(),
+                 infinity = std::numeric_limits<double>::infinity();
+    const std::vector<double> good{41.3, 12.8, -12.7, 43.1, 11.9, -13.1, 45.7, 10.3, -13.9};
+    struct Refused {
+        double t0, dt, last;
+        int n, status;
+        std::size_t entries;  // in the call tree: the fit of an axis was reached
+    };
+    for (const Refused& row : {Refused{0.0, 10.0, -13.9, 0, 1, 0}, Refused{0.0, 10.0, -13.9, -3, 1, 0},
+                               Refused{0.0, 0.0, -13.9, 3, 1, 1}, Refused{0.0, nan, -13.9, 3, 1, 1},
+                               Refused{infinity, 10.0, -13.9, 3, 1, 1}, Refused{0.0, 10.0, nan, 3, 10, 1},
+                               Refused{0.0, 10.0, -infinity, 3, 10, 1}}) {
+        const test::Report report;
+        std::vector<double> positions = good;
+        positions.back() = row.last;
+        double c[3][3] = {{17.3}, {17.3}, {17.3}};
+        EXPECT_EQ(orb_interp(row.t0, row.dt, positions.data(), nullptr, row.n, c[0], c[1], c[2]), row.status);
+        EXPECT_EQ(c[0][0] + c[1][0] + c[2][0], 3 * 17.3);
+        EXPECT_EQ(report.entries("ERROR").size(), 1U);
+        const auto tree = report.entries("ERROR_CALL_TREE");
+        ASSERT_EQ(tree.size(), row.entries);
+        for (const auto& entry : tree) EXPECT_EQ(entry.function, "orb_interp");
+    }
+}
+
+TEST(OrbInterp, SurvivesEveryFailedAllocation) {
+    const test::Report report;
+    const std::vector<double> positions(15, 17.3);
+    test::fail_every_allocation([&] { return Trajectory{0.0, 10.0, positions}.status; });
+}
+
+// Whatever a header may hold: the coefficients are finite, and the values are met as far as their size allows.
+TEST(Orbffit, GivesFiniteCoefficientsForAnyFiniteValues) {
+    constexpr int kCount = 3001;
+    const double most = std::numeric_limits<double>::max();
+    for (const double size : {0.0, 5e-324, 1.7e-3, 1e300, most})
+        for (const double sign : {+1.0, -1.0})
+            for (const double dt : {1e-300, -10.0, 60.0, 1e300}) {
+                SCOPED_TRACE(testing::Message() << size << " sign " << sign << " dt " << dt);
+                std::vector<double> values(kCount, size), c(kCount, std::numeric_limits<double>::quiet_NaN());
+                for (std::size_t i = 1; i < values.size(); i += 2) values[i] = sign * size;
+                for (const int n : {2, 5, 40, kCount}) {
+                    const int status = orbffit(0.0, dt, values.data(), n, c.data());
+                    ASSERT_TRUE(status == 10 ||
+                                (status == 0 && std::all_of(c.begin(), c.begin() + n,
+                                                            [](double v) { return std::isfinite(v); })));
+                }
+            }
+}
+
+}  // namespace
