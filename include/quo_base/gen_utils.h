@@ -103,7 +103,7 @@ typedef struct DateFields {
     double fraction; /**< rest of the second, 0 <= fraction < 1 */
 } DateFields;
 
-/** Codes of date2str. The unit's digits combine; two checks share one flag. */
+/** Codes of date2str. All but the first are flags that combine; month and minute share one. */
 enum DateError {
     DATE_NO_TEXT = -1,                 /**< empty, or no digit in it */
     DATE_BAD_DAY = 0x1,                /**< below 0 or beyond the month's end */

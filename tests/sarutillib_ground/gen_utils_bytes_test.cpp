@@ -1,0 +1,205 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <bit>
+#include <cstdint>
+#include <numeric>
+#include <string>
+#include <vector>
+
+#include "quo_base/gen_utils.h"
+
+namespace {
+
+using Bytes = std::vector<unsigned char>;
+
+/** Different bytes all along, none of them symmetric under an exchange. */
+Bytes ramp(std::size_t size) {
+    Bytes bytes(size);
+    std::iota(bytes.begin(), bytes.end(), static_cast<unsigned char>(17));
+    return bytes;
+}
+
+/** The first `count` elements after `offset`, each reversed. */
+Bytes reversed(Bytes bytes, std::size_t offset, std::size_t count, std::size_t size) {
+    for (std::size_t i = 0; i < count; ++i) {
+        const auto element = bytes.begin() + static_cast<std::ptrdiff_t>(offset + i * size);
+        std::reverse(element, element + static_cast<std::ptrdiff_t>(size));
+    }
+    return bytes;
+}
+
+TEST(ByteOrder, ReadsNumbersAtAnyAddressInBothOrders) {
+    const unsigned char b[] = {0x00, 0xC0, 0x09, 0x21, 0xFB, 0x54, 0x44, 0x2D, 0x18};  // at 1: -3.1415926535897931
+    EXPECT_EQ(ch2double8(b + 1, 'm'), -3.141592653589793);
+    EXPECT_EQ(ch2uint2(b + 1, 'm'), 0xC009);
+    EXPECT_EQ(ch2uint2(b + 1, 'l'), 0x09C0);
+    EXPECT_EQ(ch2int2(b + 1, 'm'), 0xC009 - 0x10000);
+    EXPECT_EQ(ch2uint4(b + 1, 'm'), 0xC00921FB);
+    EXPECT_EQ(ch2uint4(b + 1, 'l'), 0xFB2109C0);
+    EXPECT_EQ(ch2int4(b + 1, 'l'), static_cast<std::int64_t>(0xFB2109C0) - 0x100000000);
+    EXPECT_EQ(ch2long4(b + 1, 'm'), static_cast<std::int64_t>(0xC00921FB) - 0x100000000);
+    const unsigned char f[] = {0xDB, 0x0F, 0x49, 0xC0};
+    EXPECT_EQ(ch2float4(f, 'l'), -3.14159274F);
+    const unsigned char d[] = {0x18, 0x2D, 0x44, 0x54, 0xFB, 0x21, 0x09, 0x40};
+    EXPECT_EQ(ch2double8(d, 'l'), 3.141592653589793);
+    EXPECT_EQ(endi(), std::endian::native == std::endian::little ? 'l' : 'm');
+    EXPECT_EQ(bsw2b(0x12FE), 0xFE12);
+}
+
+TEST(ByteOrder, WritesNumbersInBothOrders) {
+    const auto written = [](auto writer, auto value, char order) {
+        Bytes bytes(7, 0xEE);
+        writer(value, bytes.data() + 1, order);
+        return bytes;
+    };
+    EXPECT_EQ(written(float2ch, -3.14159274F, 'm'), (Bytes{0xEE, 0xC0, 0x49, 0x0F, 0xDB, 0xEE, 0xEE}));
+    EXPECT_EQ(written(float2ch, -3.14159274F, 'l'), (Bytes{0xEE, 0xDB, 0x0F, 0x49, 0xC0, 0xEE, 0xEE}));
+    EXPECT_EQ(written(long2ch, -5478, 'm'), (Bytes{0xEE, 0xFF, 0xFF, 0xEA, 0x9A, 0xEE, 0xEE}));
+    EXPECT_EQ(written(long2ch, 5478, 'l'), (Bytes{0xEE, 0x66, 0x15, 0x00, 0x00, 0xEE, 0xEE}));
+    EXPECT_EQ(written(short2ch, std::int16_t{-2}, 'm'), (Bytes{0xEE, 0xFF, 0xFE, 0xEE, 0xEE, 0xEE, 0xEE}));
+    EXPECT_EQ(written(short2ch, std::int16_t{258}, 'l'), (Bytes{0xEE, 0x02, 0x01, 0xEE, 0xEE, 0xEE, 0xEE}));
+}
+
+TEST(ByteOrderDeathTest, EndsTheProcessOnAnyOtherCode) {
+    unsigned char bytes[8] = {};
+    const auto dies = [](auto call) {
+        const auto watched = [&] {
+            dup2(STDERR_FILENO, STDOUT_FILENO);  // the message goes to the standard output
+            call();
+        };
+        EXPECT_EXIT(watched(), testing::ExitedWithCode(1), "^\norder must be 'm' or 'l'!\n$");
+    };
+    dies([&] { ch2uint2(bytes, 'b'); });
+    dies([&] { ch2int4(bytes, 'M'); });
+    dies([&] { ch2float4(bytes, '\0'); });
+    dies([&] { ch2double8(bytes, 'L'); });
+    dies([&] { float2ch(1.0F, bytes, 'x'); });
+    dies([&] { long2ch(1, bytes, ' '); });
+    dies([&] { short2ch(1, bytes, '1'); });
+}
+
+// Every count up to a few vectors' width, at an odd address, with bytes before and behind that stay.
+TEST(Swap, ReversesEachElementAndNothingElse) {
+    struct Swapper {
+        std::size_t size;
+        void (*swap)(void*, std::int64_t);
+    };
+    for (const auto [size, swap] : {Swapper{2, swp2}, Swapper{4, swp4}, Swapper{8, swp8}})
+        for (std::size_t count = 0; count <= 70; ++count) {
+            SCOPED_TRACE(testing::Message() << count << " elements of " << size);
+            const Bytes before = ramp(1 + size * count + 8);
+            Bytes bytes = before;
+            swap(bytes.data() + 1, static_cast<std::int64_t>(count));
+            EXPECT_EQ(bytes, reversed(before, 1, count, size));
+            swap(bytes.data() + 1, -3);
+            EXPECT_EQ(bytes, reversed(before, 1, count, size));
+        }
+}
+
+struct AnySize {
+    std::int64_t length;
+    int size;
+    std::size_t swapped;  // elements
+};
+constexpr AnySize kAnySizes[] = {{48, 16, 3}, {40, 16, 2}, {15, 16, 0}, {0, 16, 0}, {24, 6, 4}, {7, 2, 3},
+                                 {-16, 4, 0}, {48, 5, 0},  {48, -2, 0}, {48, 0, 0}, {48, 1, 0}, {48, 48, 1}};
+
+TEST(SwapAny, TakesWholeElementsOfEvenSize) {
+    for (const auto [length, size, swapped] : kAnySizes) {
+        SCOPED_TRACE(testing::Message() << length << " bytes of elements of " << size);
+        Bytes bytes = ramp(50);
+        swp_any(bytes.data() + 1, length, size);
+        EXPECT_EQ(bytes, reversed(ramp(50), 1, swapped, static_cast<std::size_t>(std::max(size, 0))));
+    }
+}
+
+struct Block {
+    std::int64_t count;
+    int size, swap, result;
+    std::size_t swapped;
+};
+constexpr Block kBlocks[] = {{5, 2, 1, 0, 5},
+                             {5, 4, -1, 0, 5},
+                             {5, 8, 1, 0, 5},
+                             {5, 1, 1, 0, 0},
+                             {5, 4, 0, 0, 0},
+                             {5, 3, 0, 0, 0},
+                             {5, 3, 1, -1, 0},
+                             {5, 32, 1, -1, 0},
+                             {5, -4, 1, -1, 0},
+                             {5, 0, 1, -1, 0},
+                             {5, 16, 1, 0, 0},    // deliberate: five bytes hold
+                                                  // no element of sixteen
+                             {33, 16, 1, 0, 2}};  // deliberate: 33 bytes hold two
+
+TEST(GetEndian, SwapsByElementSize) {
+    for (const auto [count, size, swap, result, swapped] : kBlocks) {
+        SCOPED_TRACE(testing::Message() << count << " elements of " << size << ", swap " << swap);
+        Bytes bytes = ramp(100);
+        EXPECT_EQ(get_endian(bytes.data(), count, size, swap), result);
+        EXPECT_EQ(bytes, reversed(ramp(100), 0, swapped, static_cast<std::size_t>(std::max(size, 0))));
+    }
+}
+
+enum Class { kFinite, kInfinite, kNotANumber };
+
+struct DoubleClass {
+    std::uint64_t bits;
+    Class expected;
+};
+constexpr DoubleClass kDoubles[] = {{0x0000000000000000, kFinite},
+                                    {0x0000000000000001, kFinite},
+                                    {0x7FEFFFFFFFFFFFFF, kFinite},
+                                    {0xFFEFFFFFFFFFFFFF, kFinite},
+                                    {0x400921FB54442D18, kFinite},
+                                    {0x7FF0000000000000, kInfinite},
+                                    {0xFFF0000000000000, kInfinite},
+                                    {0x7FF8000000000000, kNotANumber},
+                                    {0xFFF8000000000000, kNotANumber},
+                                    {0x7FF0000100000000, kNotANumber},
+                                    {0x7FFFFFFFFFFFFFFF, kNotANumber},
+                                    // Deliberate: what only the low word tells is not seen.
+                                    {0x7FF0000000000001, kInfinite},
+                                    {0xFFF00000FFFFFFFF, kInfinite}};
+
+TEST(NumberClass, OfADoubleLooksAtTheHighWord) {
+    for (const auto [bits, expected] : kDoubles) {
+        SCOPED_TRACE(testing::Message() << std::hex << bits);
+        const auto x = std::bit_cast<double>(bits);
+        EXPECT_EQ(myfinite(x), expected == kFinite);
+        EXPECT_EQ(myisinf(x), expected == kInfinite);
+        EXPECT_EQ(myisnan(x), expected == kNotANumber);
+    }
+}
+
+struct FloatClass {
+    std::uint32_t bits;
+    Class expected;
+};
+constexpr FloatClass kFloats[] = {{0x00000000, kFinite},
+                                  {0x80000001, kFinite},
+                                  {0x7F7FFFFE, kFinite},
+                                  {0x40490FDB, kFinite},
+                                  {0x7F800000, kInfinite},
+                                  {0xFF800000, kInfinite},
+                                  {0x7F800001, kNotANumber},
+                                  {0xFFC00000, kNotANumber},
+                                  {0x7FFFFFFF, kNotANumber},
+                                  // Deliberate: the largest float stands for infinity.
+                                  {0x7F7FFFFF, kInfinite},
+                                  {0xFF7FFFFF, kInfinite}};
+
+TEST(NumberClass, OfAFloatTakesTheLargestForInfinite) {
+    for (const auto [bits, expected] : kFloats) {
+        SCOPED_TRACE(testing::Message() << std::hex << bits);
+        const auto x = std::bit_cast<float>(bits);
+        EXPECT_EQ(myfinite4(x), expected == kFinite);
+        EXPECT_EQ(myisinf4(x), expected == kInfinite);
+        EXPECT_EQ(myisnan4(x), expected == kNotANumber);
+    }
+}
+
+}  // namespace

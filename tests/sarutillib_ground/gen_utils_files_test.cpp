@@ -1,0 +1,157 @@
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <filesystem>
+#include <limits>
+#include <string>
+
+#include "quo_base/gen_utils.h"
+#include "sarutillib/file_io.h"
+#include "support/diagnostics.h"
+
+namespace {
+
+using test::read_text;
+using test::TemporaryFolder;
+using test::write_text;
+
+constexpr std::int64_t kFar = 5'368'709'213;  // beyond 32 bits
+
+class Seek : public testing::Test {
+protected:
+    /** A sparse file with a mark far out, and a short tail behind it. */
+    void SetUp() override {
+        const std::string name = folder_.file("image.raw");
+        write_text(name, "first");
+        std::filesystem::resize_file(name, static_cast<std::uintmax_t>(kFar));
+        {
+            const quo::Stream tail{std::fopen(name.c_str(), "ab")};
+            std::fputs("mark and tail", tail.get());
+        }
+        stream_.reset(std::fopen(name.c_str(), "r+b"));
+        ASSERT_TRUE(stream_);
+    }
+    std::string read(std::size_t size) {
+        std::string text(size, '\0');
+        text.resize(std::fread(text.data(), 1, size, stream_.get()));
+        return text;
+    }
+    off_t descriptor_at() { return lseek(fileno(stream_.get()), 0, SEEK_CUR); }
+
+    TemporaryFolder folder_;
+    quo::Stream stream_;
+};
+
+TEST_F(Seek, CountsFromStartPositionAndEnd) {
+    EXPECT_EQ(myfseek64_msc(stream_.get(), kFar, 0), 0);
+    EXPECT_EQ(descriptor_at(), kFar);
+    EXPECT_EQ(read(4), "mark");
+    EXPECT_EQ(myfseek64_msc(stream_.get(), 5, 1), 0);
+    EXPECT_EQ(descriptor_at(), kFar + 9);
+    EXPECT_EQ(read(4), "tail");
+    EXPECT_EQ(myfseek64_msc(stream_.get(), -kFar - 13, 2), 0);
+    EXPECT_EQ(descriptor_at(), 0);
+    EXPECT_EQ(read(5), "first");
+    EXPECT_EQ(myfseek64_msc(stream_.get(), -3, 1), 0);  // within what the stream has buffered
+    EXPECT_EQ(descriptor_at(), 2);
+    EXPECT_EQ(read(3), "rst");
+}
+
+TEST_F(Seek, ReadsAgainAfterTheEndOfTheFile) {
+    myfseek64_msc(stream_.get(), -4, 2);
+    EXPECT_EQ(read(10), "tail");
+    ASSERT_NE(std::feof(stream_.get()), 0);
+    EXPECT_EQ(myfseek64_msc(stream_.get(), kFar, 0), 0);
+    EXPECT_EQ(std::feof(stream_.get()), 0);
+    EXPECT_EQ(read(4), "mark");
+}
+
+TEST_F(Seek, FlushesWhatWasWrittenAndWritesAtTheNewPlace) {
+    std::fputs("FIRST", stream_.get());
+    EXPECT_EQ(myfseek64_msc(stream_.get(), kFar + 5, 0), 0);
+    const quo::Stream other{std::fopen(folder_.file("image.raw").c_str(), "rb")};
+    std::string seen(5, '\0');
+    EXPECT_EQ(std::fread(seen.data(), 1, 5, other.get()), 5U);
+    EXPECT_EQ(seen, "FIRST");
+    std::fputs("AND", stream_.get());
+    EXPECT_EQ(myfseek64_msc(stream_.get(), -8, 1), 0);
+    EXPECT_EQ(read(20), "mark AND tail");
+}
+
+TEST_F(Seek, RefusesWhatLeadsNowhere) {
+    myfseek64_msc(stream_.get(), 2, 0);
+    EXPECT_EQ(myfseek64_msc(stream_.get(), 0, 3), -1);
+    EXPECT_EQ(myfseek64_msc(stream_.get(), 0, -1), -1);
+    EXPECT_EQ(myfseek64_msc(stream_.get(), -1, 0), -1);
+    EXPECT_EQ(myfseek64_msc(stream_.get(), -3, 1), -1);
+    EXPECT_EQ(myfseek64_msc(stream_.get(), std::numeric_limits<std::int64_t>::max(), 1), -1);
+    EXPECT_EQ(read(3), "rst");
+    EXPECT_EQ(myfseek64_msc(stream_.get(), std::numeric_limits<std::int64_t>::max(), 2), -1);
+
+    int ends[2];
+    ASSERT_EQ(pipe(ends), 0);
+    const quo::Stream in{fdopen(ends[0], "rb")}, out{fdopen(ends[1], "wb")};
+    for (const int whence : {0, 1, 2}) EXPECT_EQ(myfseek64_msc(in.get(), 0, whence), -1);
+    errno = 0;
+}
+
+struct Path {
+    const char *path, *without_separator, *name;
+    int length;
+};
+constexpr Path kPaths[] = {
+    {"dir/", "dir", "", 4},
+    {"dir\\", "dir", "", 4},
+    {"dir//", "dir/", "", 5},
+    {"dir", "dir", "dir", 3},
+    {"/", "", "", 1},
+    {"", "", "", 0},
+    {"a/b\\c", "a/b\\c", "b\\c", 5},  // deliberate: the backslash belongs to the name
+    {"a\\b\\c.xml", "a\\b\\c.xml", "c.xml", 9},
+    {"\\a/b/c.xml", "\\a/b/c.xml", "c.xml", 10},
+};
+
+TEST(Paths, LoseOneSeparatorAndShowTheirName) {
+    for (const Path& row : kPaths) {
+        SCOPED_TRACE(row.path);
+        std::string path = row.path;
+        EXPECT_STREQ(getFileNameFromPath(row.path), row.name);
+        EXPECT_EQ(check_fsep(path.data()), row.length);
+        EXPECT_STREQ(path.c_str(), row.without_separator);
+    }
+}
+
+TEST(CopyParameterFile, CopiesEveryByte) {
+    const TemporaryFolder folder;
+    std::string content = "[Section]\r\n";
+    for (int i = 0; i < 70000; ++i) content += static_cast<char>(i * 37 % 256);
+    write_text(folder.file("source"), content);
+    write_text(folder.file("old"), content + "longer than the source");
+    for (const char* name : {"old", "new"}) {
+        EXPECT_EQ(copyParameterFile(folder.file("source").c_str(), folder.file(name).c_str()), 0);
+        EXPECT_EQ(read_text(folder.file(name)), content);
+    }
+    EXPECT_EQ(copyParameterFile(folder.file("old").c_str(), folder.file("old").c_str()), 0);
+    EXPECT_EQ(read_text(folder.file("old")), content);
+}
+
+TEST(CopyParameterFile, KeepsTheDestinationAndSaysNothingWhenItCannot) {
+    const TemporaryFolder folder;
+    const std::string kept = folder.file("kept");
+    write_text(kept, "kept");
+    mkfifo(folder.file("pipe").c_str(), 0600);
+    const std::string sources[] = {folder.file("missing"), folder.file(""), folder.file("pipe"), ""};
+    test::CapturedStderr captured;
+    for (const std::string& source : sources) EXPECT_EQ(copyParameterFile(source.c_str(), kept.c_str()), 0);
+    EXPECT_EQ(copyParameterFile(kept.c_str(), folder.file("no_folder/copy").c_str()), 0);
+    EXPECT_EQ(copyParameterFile(kept.c_str(), folder.file("").c_str()), 0);
+    EXPECT_EQ(copyParameterFile(nullptr, nullptr), 0);
+    EXPECT_EQ(errno, 0);
+    EXPECT_EQ(captured.text(), "");
+    EXPECT_EQ(read_text(kept), "kept");
+}
+
+}  // namespace

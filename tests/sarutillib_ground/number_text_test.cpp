@@ -1,0 +1,252 @@
+#include "sarutillib/number_text.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <array>
+#include <bit>
+#include <cerrno>
+#include <cmath>
+#include <cstdio>
+#include <cstdlib>
+#include <limits>
+#include <random>
+#include <string>
+#include <vector>
+
+namespace {
+
+using testing::IsEmpty;
+using Double = std::numeric_limits<double>;
+
+/** Values as products hold them (a few digits, moderate powers of ten) in turn with any bit pattern, after the
+ * numbers where texts and roundings change their form. */
+std::vector<double> mixed_values(std::size_t count) {
+    std::vector<double> values{0.0,
+                               -0.0,
+                               0.5,
+                               1.5,
+                               2.5,
+                               0.125,
+                               1e23,
+                               9007199254740993.0,
+                               123456789012345.6,
+                               1e15,
+                               1e16,
+                               Double::infinity(),
+                               -Double::infinity(),
+                               Double::quiet_NaN(),
+                               -Double::quiet_NaN(),
+                               Double::max(),
+                               -Double::max(),
+                               Double::min(),
+                               Double::denorm_min(),
+                               999999.5,
+                               9.5e-5};
+    for (int power = -323; power <= 308; ++power) {
+        const double value = std::strtod(("1e" + std::to_string(power)).c_str(), nullptr);
+        values.insert(values.end(), {value, std::nextafter(value, 0.0), std::nextafter(value, 1e308)});
+    }
+    for (int power = -1074; power <= 1023; ++power) values.push_back(std::ldexp(1.0, power));
+
+    std::mt19937_64 random{20040703};
+    while (values.size() < count) {
+        const auto digits = static_cast<double>(static_cast<std::int64_t>(random() % 2000000000) - 1000000000);
+        values.push_back(digits * std::pow(10.0, -static_cast<int>(random() % 12)));
+        values.push_back(std::bit_cast<double>(random()));
+    }
+    return values;
+}
+
+/** The C library's text of a value. */
+std::string decimal(int precision, double value) {
+    std::array<char, 400> text;
+    std::snprintf(text.data(), text.size(), "%.*g", precision, value);
+    return text.data();
+}
+std::string hexadecimal(int precision, double value) {
+    std::array<char, 400> text;
+    std::snprintf(text.data(), text.size(), "%.*a", precision, value);
+    return text.data();
+}
+
+bool same_number(double a, double b) {
+    if (std::isnan(a) || std::isnan(b))
+        return std::isnan(a) && std::isnan(b) && std::signbit(a) == std::signbit(b);
+    return std::bit_cast<std::uint64_t>(a) == std::bit_cast<std::uint64_t>(b);
+}
+
+/** The first few texts on which the reading is not strtod's. */
+class Differences {
+public:
+    void compare_reading(const std::string& text) {
+        char* end = nullptr;
+        const double expected = std::strtod(text.c_str(), &end);
+        const auto length = static_cast<std::size_t>(end - text.c_str());
+        const std::vector<char> unterminated(text.begin(), text.end());  // so that a step too far shows
+        const auto found = quo::scan_double({unterminated.data(), unterminated.size()});
+        if (found.length != length || !same_number(found.value, expected))
+            note("'" + text + "' as " + decimal(17, found.value) + ", length " + std::to_string(found.length));
+    }
+    void note(std::string difference) {
+        if (list_.size() < 5) list_.push_back(std::move(difference));
+    }
+    [[nodiscard]] const std::vector<std::string>& list() const { return list_; }
+
+private:
+    std::vector<std::string> list_;
+};
+
+const std::vector<double>& million() {
+    static const std::vector<double> values = mixed_values(1000000);
+    return values;
+}
+
+TEST(FormatGeneral, IsPrintfForAMillionMixedValues) {
+    Differences differences;
+    std::mt19937 random{151};
+    for (const double value : million())
+        for (const int precision : {15, static_cast<int>(random() % 21)}) {
+            const auto found = quo::format_general(value, precision);
+            if (decimal(precision, value) != found.data || found.size != std::string_view{found.data}.size())
+                differences.note(decimal(precision, value) + " as " + found.data);
+        }
+    EXPECT_THAT(differences.list(), IsEmpty());
+}
+
+TEST(FormatGeneral, BoundsThePrecision) {
+    EXPECT_STREQ(quo::format_general(-Double::min(), 400).data, decimal(32, -Double::min()).c_str());
+    EXPECT_STREQ(quo::format_general(-1.0 / 3072.0, 400).data, decimal(32, -1.0 / 3072.0).c_str());
+    EXPECT_STREQ(quo::format_general(299792458.0, -1).data, "2.99792e+08");
+}
+
+TEST(FormatExact, ReadsBackAndIsNoLongerThanThePrintfTextThatDoes) {
+    Differences differences;
+    for (std::size_t i = 0; i < million().size(); i += 7) {
+        const double value = million()[i];
+        const auto reads_back = [value](const std::string& text) {
+            return same_number(std::strtod(text.c_str(), nullptr), value);
+        };
+        std::string shortest;
+        for (int precision = 15; precision <= 17 && (shortest.empty() || !reads_back(shortest)); ++precision)
+            shortest = decimal(precision, value);
+        const auto found = quo::format_exact(value);
+        if (!reads_back(found.data) || found.size > shortest.size()) differences.note(found.data);
+    }
+    EXPECT_THAT(differences.list(), IsEmpty());
+}
+
+TEST(ScanDouble, IsStrtodForAMillionMixedValues) {
+    Differences differences;
+    std::mt19937 random{134};
+    for (const double value : million()) {
+        differences.compare_reading(decimal(static_cast<int>(random() % 21), value));
+        differences.compare_reading(hexadecimal(static_cast<int>(random() % 15), value));
+    }
+    EXPECT_THAT(differences.list(), IsEmpty());
+}
+
+// Numbers half way between two doubles, and just beside that, need every digit.
+TEST(ScanDouble, RoundsTiesAsStrtodDoes) {
+    Differences differences;
+    std::mt19937_64 random{99};
+    for (int i = 0; i < 20000; ++i) {
+        const auto mantissa = static_cast<long double>(random() >> 11 | 1);
+        const int exponent = static_cast<int>(random() % 120) - 80;
+        std::array<char, 400> tie;
+        std::snprintf(tie.data(), tie.size(), "%.140Lf", std::ldexp(2 * mantissa + 1, exponent));
+        differences.compare_reading(tie.data());
+        differences.compare_reading(std::string{tie.data()} + "1");
+        differences.compare_reading(decimal(19, static_cast<double>(std::ldexp(mantissa, exponent))));
+    }
+    EXPECT_THAT(differences.list(), IsEmpty());
+}
+
+// Pieces of numbers in any order: signs in wrong places, marks without digits, digits beyond every range.
+TEST(ScanDouble, IsStrtodForBrokenTexts) {
+    constexpr std::array<const char*, 28> kPieces{" ",
+                                                  "\t",
+                                                  "\v",
+                                                  "+",
+                                                  "-",
+                                                  "0",
+                                                  "0x",
+                                                  "X",
+                                                  "1",
+                                                  "7",
+                                                  "9",
+                                                  "99999999999999999999",
+                                                  "000000000000000000000",
+                                                  ".",
+                                                  "e",
+                                                  "E",
+                                                  "p",
+                                                  "-30",
+                                                  "+400",
+                                                  "inf",
+                                                  "INFINITY",
+                                                  "nan",
+                                                  "nan(",
+                                                  "abc",
+                                                  ")",
+                                                  "_12",
+                                                  "f",
+                                                  "\xA0"};
+    Differences differences;
+    std::mt19937 random{17};
+    for (int i = 0; i < 400000; ++i) {
+        std::string text;
+        for (auto pieces = 1 + random() % 8; pieces > 0; --pieces) text += kPieces[random() % kPieces.size()];
+        differences.compare_reading(text);
+    }
+    differences.compare_reading("");
+    EXPECT_THAT(differences.list(), IsEmpty());
+}
+
+TEST(ScanDouble, LeavesErrnoAloneBeyondTheRange) {
+    errno = 0;
+    EXPECT_EQ(quo::scan_double("1.79769313486232e+308").value, Double::infinity());
+    EXPECT_EQ(quo::scan_double("-1e-400").value, 0.0);
+    EXPECT_EQ(errno, 0);
+}
+
+struct IntegerText {
+    const char* text;
+    std::size_t length;
+    std::int64_t wide;
+    std::int32_t narrow;
+};
+constexpr auto kMax32 = std::numeric_limits<std::int32_t>::max(),
+               kMin32 = std::numeric_limits<std::int32_t>::min();
+constexpr auto kMax64 = std::numeric_limits<std::int64_t>::max(),
+               kMin64 = std::numeric_limits<std::int64_t>::min();
+constexpr IntegerText kIntegers[] = {
+    {"803457", 6, 803457, 803457},
+    {" \n\t+17;", 6, 17, 17},
+    {"-0042.5", 5, -42, -42},
+    {"0x1F", 1, 0, 0},
+    {"", 0, 0, 0},
+    {"  -", 0, 0, 0},
+    {"+-3", 0, 0, 0},
+    {"abc", 0, 0, 0},
+    {"2147483648", 10, 2147483648, kMax32},
+    {"-2147483649", 11, -2147483649, kMin32},
+    {"9223372036854775807", 19, kMax64, kMax32},
+    {"9223372036854775808 ", 19, kMax64, kMax32},
+    {"-9223372036854775809", 20, kMin64, kMin32},
+    {"-99999999999999999999999", 24, kMin64, kMin32},
+};
+
+TEST(ScanInteger, StopsAtTheBounds) {
+    for (const IntegerText& row : kIntegers) {
+        SCOPED_TRACE(row.text);
+        EXPECT_EQ(quo::scan_int64(row.text).value, row.wide);
+        EXPECT_EQ(quo::scan_int64(row.text).length, row.length);
+        EXPECT_EQ(quo::scan_int32(row.text).value, row.narrow);
+        EXPECT_EQ(quo::scan_int32(row.text).length, row.length);
+    }
+    for (const std::int64_t value : {kMin64, std::int64_t{-999}, std::int64_t{0}, kMax64})
+        EXPECT_EQ(quo::format_int(value).data, std::to_string(value));
+}
+
+}  // namespace
