@@ -1,0 +1,426 @@
+#include "quo_base/SARpolynomials.h"
+
+#include <algorithm>
+#include <new>
+#include <optional>
+#include <span>
+#include <string>
+
+#include "diagnosticslib/call_frame.h"
+#include "quo_base/profile.h"
+#include "quorelxmllib/field_table.h"
+#include "quorelxmllib/header_session.h"
+#include "sarutillib/bounded_text.h"
+#include "sarutillib/checked_size.h"
+#include "sarutillib/file_io.h"
+
+namespace {
+
+constexpr const char* kSource = "generalSAR";
+constexpr const char* kSetSection = "PolySAR";
+// No form of a polynomial in a file is shorter than this: a count that asks for more is not believed.
+constexpr std::int64_t kShortestPolynomial = 40;
+
+namespace plain {
+using Obj = poly;
+/** The fields of a polynomial with one quantity's parameter-file keys. */
+constexpr auto table(const char* coefficients, const char* range, const char* azimuth) {
+    return quo::FieldTable{kSetSection, QUO_FIELD(pol, coefficients),
+                           QUO_FIELD(trg0, quo::element("trg0_s"), range),
+                           QUO_FIELD(taz0, quo::element("taz0_s"), azimuth)};
+}
+using Table = decltype(table("", "", ""));
+constexpr Table kTable = table("pol", "trg0_s", "taz0_s");
+constexpr Table kDC = table("DCpoly", "DCpoly_rgt0", "DCpoly_azt0");
+constexpr Table kFR = table("FRpoly", "FRPoly_rgt0", "FRpoly_azt0");  // deliberate: the capital P of the range key
+constexpr Table kSL2GR = table("SL2GRpoly", "SL2GRpoly_rgt0", "SL2GRpoly_azt0");
+constexpr Table kGR2SL = table("GR2SLpoly", "GR2SLpoly_rgt0", "GR2SLpoly_azt0");
+constexpr Table kSL2THETA = table("SL2THETApoly", "SL2THETApoly_rgt0", "SL2THETApoly_azt0");
+constexpr Table kSL2PHI = table("SL2PHIpoly", "SL2PHIpoly_rgt0", "SL2PHIpoly_azt0");
+
+int read(poly& object, const char* file, const char* name, const Table& table) {
+    return object.poly::readpar(file, name) == QUO_OK ? QUO_OK : table.read_profile(object, file, name);
+}
+}  // namespace plain
+
+namespace extended {
+using Obj = extended_poly;
+constexpr quo::FieldTable kTable{kSetSection, QUO_FIELD(pol), QUO_FIELD(trg0, quo::element("trg0_s")),
+                                 QUO_FIELD(taz0, quo::element("taz0_s"))};
+}  // namespace extended
+
+namespace counts {
+using Obj = polySAR;
+constexpr quo::FieldTable kTable{kSetSection,       QUO_FIELD(ndc),       QUO_FIELD(nfr),    QUO_FIELD(nsl2gr),
+                                 QUO_FIELD(ngr2sl), QUO_FIELD(nsl2theta), QUO_FIELD(nsl2phi)};
+}  // namespace counts
+
+std::string section_of(const char* name) { return std::string{kSetSection} + '/' + (name ? name : ""); }
+
+// A polynomial in range alone: x^2, x^3 and x^4 follow the linear term, the azimuth terms are 0.
+void set_pure_range(double (&pol)[7], const double (&a)[5]) {
+    const double c[7] = {a[0], a[1], 0.0, 0.0, a[2], a[3], a[4]};
+    std::ranges::copy(c, pol);
+}
+
+bool read_doubles(const char* section, const char* key, double* values, int count, const char* file) {
+    return GetProfileDoubleArray(section, key, values, count, file) == QUO_OK;
+}
+
+/** What tells the six lists apart. */
+struct Quantity {
+    const char *name, *file_name, *none;
+    bool extrapolates;
+};
+constexpr Quantity kQuantities[] = {
+    {"DC", "DopplerCentroid", "NO DC poly available", true},
+    {"FR", "DopplerRate", "NO FR poly available", true},
+    {"SL2GR", "SlantToGround", "NO SL2GR poly available", false},
+    {"GR2SL", "GroundToSlant", "NO GR2SL poly available", false},
+    {"SL2THETA", "SlantToTheta", "NO SL2THETA poly available", false},
+    {"SL2PHI", "SlantToPhi", "NO SL2PHI poly available", false},
+};
+
+/** One list, ordered by reference azimuth time. */
+template <typename P>
+class List {
+public:
+    List(const Quantity& quantity, const std::unique_ptr<P[]>& polynomials, int count)
+        : quantity_{quantity},
+          p_{polynomials.get(), polynomials ? static_cast<std::size_t>(std::max(count, 0)) : 0} {}
+
+    [[nodiscard]] const Quantity& quantity() const { return quantity_; }
+    [[nodiscard]] bool empty() const { return p_.empty(); }
+
+    /** The first at or after the azimuth time, else the last. */
+    [[nodiscard]] const P& selected(double azimuth) const {
+        return p_[std::min(first_at_or_after(azimuth), p_.size() - 1)];
+    }
+    /** Index of the earlier of the two around the azimuth time. */
+    [[nodiscard]] std::size_t earlier(double azimuth) const {
+        const std::size_t next = first_at_or_after(azimuth);
+        if (next == 0) return 0;
+        return azimuth >= p_.back().taz0 ? p_.size() - 1 : std::min(next, p_.size()) - 1;
+    }
+    [[nodiscard]] const P& operator[](std::size_t i) const { return p_[i]; }
+
+    void coefficients(double azimuth, double* c) const {
+        if (p_.size() == 1) return copy(p_[0], c);
+        if (azimuth < p_.front().taz0) {
+            return quantity_.extrapolates ? blend(0, weight(0, azimuth), c) : copy(p_.front(), c);
+        }
+        if (azimuth > p_.back().taz0) return beyond(azimuth, c);
+        const std::size_t k = std::min(earlier(azimuth), p_.size() - 2);
+        blend(k, weight(k, azimuth), c);
+    }
+
+private:
+    // A time that compares with nothing is after everything.
+    [[nodiscard]] std::size_t first_at_or_after(double azimuth) const {
+        std::size_t i = 0;
+        while (i < p_.size() && !(azimuth <= p_[i].taz0)) ++i;
+        return i;
+    }
+    [[nodiscard]] double weight(std::size_t k, double azimuth) const {
+        return (azimuth - p_[k].taz0) / (p_[k + 1].taz0 - p_[k].taz0);
+    }
+    static void copy(const P& from, double* c) { std::ranges::copy(from.pol, c); }
+    void blend(std::size_t k, double w, double* c) const {
+        for (std::size_t i = 0; i < 7; ++i) c[i] = (1.0 - w) * p_[k].pol[i] + w * p_[k + 1].pol[i];
+    }
+    void beyond(double azimuth, double* c) const {
+        if (!quantity_.extrapolates) return copy(p_.back(), c);
+        const P &last = p_.back(), &before = p_[p_.size() - 2];
+        const double w = (azimuth - last.taz0) / (last.taz0 - before.taz0);
+        for (std::size_t i = 0; i < 7; ++i) c[i] = (1.0 + w) * last.pol[i] - w * before.pol[i];
+    }
+
+    const Quantity& quantity_;
+    std::span<const P> p_;
+};
+
+/** Calls `see(list, count)` for the six lists in their order, until it returns a status other than 0. */
+template <typename Set, typename See>
+int each_list(Set& set, See see) {
+    int status = QUO_OK;
+    static_cast<void>((status = see(kQuantities[0], set.DC, set.ndc)) ||
+                      (status = see(kQuantities[1], set.FR, set.nfr)) ||
+                      (status = see(kQuantities[2], set.SL2GR, set.nsl2gr)) ||
+                      (status = see(kQuantities[3], set.GR2SL, set.ngr2sl)) ||
+                      (status = see(kQuantities[4], set.SL2THETA, set.nsl2theta)) ||
+                      (status = see(kQuantities[5], set.SL2PHI, set.nsl2phi)));
+    return status;
+}
+
+template <typename P>
+int evaluate_selected(const char* function, const List<P>& list, double range, double azimuth, double* value) {
+    quo::CallFrame frame{function, kSource};
+    if (list.empty()) return frame.fail(QUO_NUMERIC, list.quantity().none);
+    if (const int status = list.selected(azimuth).EvaluatePoly(range, azimuth, value)) return frame.callee(status);
+    return frame.success();
+}
+
+double value_around(const double* c, double x, double y) {
+    return c[0] + c[1] * x + c[2] * y + c[3] * x * y + x * x * (c[4] + x * (c[5] + x * c[6]));
+}
+
+template <typename P>
+int evaluate_interpolated(const char* function, const List<P>& list, double range, double azimuth, double* value) {
+    quo::CallFrame frame{function, kSource};
+    if (list.empty()) return frame.fail(QUO_NUMERIC, list.quantity().none);
+    double c[7];
+    list.coefficients(azimuth, c);
+    const P& origin = list[list.earlier(azimuth)];
+    *value = value_around(c, range - origin.trg0, azimuth - origin.taz0);
+    return frame.success();
+}
+
+template <typename P>
+int get_coefficients(const char* function, const List<P>& list, double azimuth, double* c) {
+    quo::CallFrame frame{function, kSource};
+    if (list.empty()) return frame.fail(QUO_NUMERIC, list.quantity().none);
+    list.coefficients(azimuth, c);
+    return frame.success();
+}
+
+template <typename P>
+int get_number(const char* function, const List<P>& list, double azimuth, int* index) {
+    quo::CallFrame frame{function, kSource};
+    if (list.empty()) return frame.fail(QUO_NUMERIC, list.quantity().none);
+    *index = static_cast<int>(list.earlier(azimuth));
+    return frame.success();
+}
+
+/** Name of polynomial `index` of a list, as it stands in a header. */
+std::string polynomial_name(const Quantity& quantity, int index) {
+    return std::string{quantity.file_name} + '-' + std::to_string(index);
+}
+
+template <typename P>
+bool make_list(std::unique_ptr<P[]>& list, std::int32_t& count, int wanted) {
+    list.reset();
+    count = 0;
+    if (wanted < 1) return true;
+    try {
+        list = std::make_unique<P[]>(static_cast<std::size_t>(wanted));
+    } catch (const std::bad_alloc&) {
+        return false;
+    }
+    count = wanted;
+    return true;
+}
+
+bool file_can_hold(const polySAR& set, const char* file) {
+    const auto bytes = quo::file_length(file);
+    quo::Checked<std::int64_t> total = 0;
+    for (const std::int32_t count : {set.ndc, set.nfr, set.nsl2gr, set.ngr2sl, set.nsl2theta, set.nsl2phi}) {
+        if (count < 0) return false;
+        total += quo::Checked<std::int64_t>{count} * kShortestPolynomial;
+    }
+    return bytes && total.value() && *total.value() <= *bytes;
+}
+
+/** The session for a file: the one that is open already, else one of our own. */
+class JoinedSession {
+public:
+    explicit JoinedSession(const char* file) {
+        if (!quo::HeaderSession::find(file)) own_.emplace(file);
+    }
+    [[nodiscard]] int commit() { return own_ ? own_->commit() : QUO_OK; }
+
+private:
+    std::optional<quo::HeaderSession> own_;
+};
+
+}  // namespace
+
+poly::poly() { createElementsVector(plain::kTable.size()); }
+void poly::refreshParameters() { plain::kTable.register_all(*this); }
+int poly::clone(poly* to) const { return plain::kTable.copy(*this, *to); }
+int poly::EvaluatePoly(double rangeTime, double azimuthTime, double* value) const {
+    *value = value_around(pol, rangeTime - trg0, azimuthTime - taz0);
+    return QUO_OK;
+}
+int poly::writepar(const char* file, const char* name) {
+    return writeAuxiliaryFile(file, 1, section_of(name).c_str());
+}
+int poly::readpar(const char* file, const char* name) {
+    return readAuxiliaryFile(file, 1, section_of(name).c_str()) ? QUO_OK : QUO_REFUSED;
+}
+
+int polyDC::readpar(const char* file, const char* name) { return plain::read(*this, file, name, plain::kDC); }
+int polyFR::readpar(const char* file, const char* name) { return plain::read(*this, file, name, plain::kFR); }
+int polySL2GR::readpar(const char* file, const char* name) {
+    return plain::read(*this, file, name, plain::kSL2GR);
+}
+int polyGR2SL::readpar(const char* file, const char* name) {
+    return plain::read(*this, file, name, plain::kGR2SL);
+}
+int polySL2THETA::readpar(const char* file, const char* name) {
+    return plain::read(*this, file, name, plain::kSL2THETA);
+}
+int polySL2PHI::readpar(const char* file, const char* name) {
+    return plain::read(*this, file, name, plain::kSL2PHI);
+}
+
+int polyDC::readparold(const char* file, const char* section) {
+    std::int32_t n = 0;
+    double range = trg0, azimuth = taz0, a5[5], a7[7];
+    bool found = GetMyProfileIntArray(section, "DopCenPol_nCoeff", &n, 1, file) == QUO_OK;
+    found = read_doubles(section, "DopCenRgRefTimes", &range, 1, file) && found;
+    found = read_doubles(section, "DopCenAzRefSec85Times", &azimuth, 1, file) && found;
+    trg0 = range;
+    taz0 = azimuth;
+    if (n == 5) {
+        if (!read_doubles(section, "DopCenRangeCoeffs", a5, 5, file)) return QUO_REFUSED;
+        set_pure_range(pol, a5);
+    } else if (n == 7) {
+        if (!read_doubles(section, "DopCenRangeCoeffs", a7, 7, file)) return QUO_REFUSED;
+        std::ranges::copy(a7, pol);
+    }
+    return found ? QUO_OK : QUO_REFUSED;
+}
+
+int polyFR::readparold(const char* file, const char* section, int n) {
+    double a3[3], a5[5], a7[7];
+    if (n == 5 && read_doubles(section, "AzimuthCoeff", a5, 5, file)) {
+        set_pure_range(pol, a5);
+        return QUO_OK;
+    }
+    if (n == 3 && read_doubles(section, "AzimuthCoeff", a3, 3, file)) {
+        pol[0] = a3[0];
+        pol[1] = a3[1];
+        pol[3] = a3[2];  // deliberate: the cross term, not x^2
+        return QUO_OK;
+    }
+    if (n == 7 && read_doubles(section, "DopRatRangeCoeff", a7, 7, file)) {
+        std::ranges::copy(a7, pol);
+        return QUO_OK;
+    }
+    return QUO_REFUSED;
+}
+
+extended_poly::extended_poly() { createElementsVector(extended::kTable.size()); }
+void extended_poly::refreshParameters() { extended::kTable.register_all(*this); }
+int extended_poly::clone(extended_poly* to) const { return extended::kTable.copy(*this, *to); }
+int extended_poly::EvaluatePoly(double rangeTime, double azimuthTime, double* value) const {
+    const double x = rangeTime - trg0, y = azimuthTime - taz0;
+    const double* e = pol;
+    *value = e[0] + e[1] * x + (e[2] + (e[3] + e[5]) * x + e[7] * x * x) * y + (e[4] + e[6] * x) * y * y +
+             x * x * x * (e[8] + x * (e[9] + x * e[10])) + y * y * y * (e[11] + y * (e[12] + y * e[13]));
+    return QUO_OK;
+}
+
+polySAR::polySAR() { createElementsVector(counts::kTable.size()); }
+void polySAR::refreshParameters() { counts::kTable.register_all(*this); }
+
+int polySAR::CreatePolys(int dc, int fr, int sl2gr, int gr2sl, int sl2theta, int sl2phi) {
+    quo::CallFrame frame{"polySAR::CreatePolys", kSource};
+    const int wanted[] = {dc, fr, sl2gr, gr2sl, sl2theta, sl2phi};
+    const int* next = wanted;
+    const int status = each_list(*this, [&](const Quantity&, auto& list, std::int32_t& count) {
+        return make_list(list, count, *next++) ? QUO_OK : QUO_NO_MEMORY;
+    });
+    if (status != QUO_OK) {
+        DestroyPolys();
+        return frame.fail(status, "Memory allocation failure");
+    }
+    return frame.success();
+}
+int polySAR::CreatePolys(int dc, int fr) { return CreatePolys(dc, fr, 0, 0, 0, 0); }
+
+int polySAR::DestroyPolys() {
+    return each_list(*this, [](const Quantity&, auto& list, std::int32_t& count) {
+        list.reset();
+        count = 0;
+        return QUO_OK;
+    });
+}
+
+// The operations of one quantity: the list, and the names that its frames carry.
+#define QUO_POLY_OPERATIONS(KIND, index, count)                                                                  \
+    int polySAR::Evaluate##KIND(double r, double a, double* value) const {                                       \
+        return evaluate_selected("polySAR::Evaluate" #KIND, List{kQuantities[index], KIND, count}, r, a, value); \
+    }                                                                                                            \
+    double polySAR::Evaluate##KIND(double r, double a) const {                                                   \
+        double value = 0.0;                                                                                      \
+        Evaluate##KIND(r, a, &value);                                                                            \
+        return value;                                                                                            \
+    }                                                                                                            \
+    int polySAR::Evaluate##KIND##interp(double r, double a, double* value) const {                               \
+        return evaluate_interpolated("polySAR::Evaluate" #KIND "interp", List{kQuantities[index], KIND, count},  \
+                                     r, a, value);                                                               \
+    }                                                                                                            \
+    double polySAR::Evaluate##KIND##interp(double r, double a) const {                                           \
+        double value = 0.0;                                                                                      \
+        Evaluate##KIND##interp(r, a, &value);                                                                    \
+        return value;                                                                                            \
+    }                                                                                                            \
+    int polySAR::get##KIND##poly(double a, double* c) const {                                                    \
+        return get_coefficients("polySAR::get" #KIND "poly", List{kQuantities[index], KIND, count}, a, c);       \
+    }                                                                                                            \
+    int polySAR::get##KIND##num(double a, int* number) const {                                                   \
+        return get_number("polySAR::get" #KIND "num", List{kQuantities[index], KIND, count}, a, number);         \
+    }
+QUO_POLY_OPERATIONS(DC, 0, ndc)
+QUO_POLY_OPERATIONS(FR, 1, nfr)
+QUO_POLY_OPERATIONS(SL2GR, 2, nsl2gr)
+QUO_POLY_OPERATIONS(GR2SL, 3, ngr2sl)
+QUO_POLY_OPERATIONS(SL2THETA, 4, nsl2theta)
+QUO_POLY_OPERATIONS(SL2PHI, 5, nsl2phi)
+#undef QUO_POLY_OPERATIONS
+
+int polySAR::writehdr(const char* file) {
+    quo::CallFrame frame{"polySAR::writehdr", kSource};
+    JoinedSession session{file};
+    if (const int status = writeAuxiliaryFile(file, 1, kSetSection)) return frame.callee(status);
+    const int status = each_list(*this, [file](const Quantity& quantity, auto& list, std::int32_t count) {
+        for (int i = 0; i < count; ++i) {
+            if (const int failed = list[i].writepar(file, polynomial_name(quantity, i).c_str())) return failed;
+        }
+        return 0;
+    });
+    if (status != QUO_OK) return frame.callee(status);
+    if (const int saved = session.commit()) return frame.callee(saved);
+    return frame.success();
+}
+
+int polySAR::readhdr(const char* file) {
+    quo::CallFrame frame{"polySAR::readhdr", kSource};
+    const JoinedSession session{file};
+    DestroyPolys();
+    if (!readAuxiliaryFile(file, 1, kSetSection) && counts::kTable.read_profile(*this, file) != QUO_OK) {
+        DestroyPolys();
+        return frame.silent(QUO_REFUSED);
+    }
+    if (!file_can_hold(*this, file)) {
+        DestroyPolys();
+        return frame.fail(QUO_REFUSED, "More polynomials than the file can hold");
+    }
+    if (const int status = CreatePolys(ndc, nfr, nsl2gr, ngr2sl, nsl2theta, nsl2phi)) return frame.callee(status);
+    const int status = each_list(*this, [file](const Quantity& quantity, auto& list, std::int32_t count) {
+        for (int i = 0; i < count; ++i) {
+            if (const int failed = list[i].readpar(file, polynomial_name(quantity, i).c_str())) return failed;
+        }
+        return 0;
+    });
+    if (status != QUO_OK) return frame.callee(status);
+    return frame.success();
+}
+
+int polySAR::clone(polySAR* to) const {
+    quo::CallFrame frame{"polySAR::clone", kSource};
+    if (to == this) return frame.success();
+    if (const int status = to->CreatePolys(ndc, nfr, nsl2gr, ngr2sl, nsl2theta, nsl2phi))
+        return frame.callee(status);
+    const auto copy = [](const auto& from, auto& target, int count) {
+        for (int i = 0; i < count; ++i) from[i].clone(&target[i]);
+    };
+    copy(DC, to->DC, ndc);
+    copy(FR, to->FR, nfr);
+    copy(SL2GR, to->SL2GR, nsl2gr);
+    copy(GR2SL, to->GR2SL, ngr2sl);
+    copy(SL2THETA, to->SL2THETA, nsl2theta);
+    copy(SL2PHI, to->SL2PHI, nsl2phi);
+    return frame.success();
+}
