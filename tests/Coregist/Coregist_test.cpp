@@ -1,0 +1,214 @@
+#include "quo_base/Coregist.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cmath>
+#include <limits>
+#include <string>
+
+#include "support/diagnostics.h"
+#include "support/fields.h"
+
+namespace {
+
+using testing::ElementsAre;
+
+struct Mapping {
+    const char* name;
+    double range[4], azimuth[4];
+};
+// Range times near 5.4 ms over 0.2 ms, azimuth times over some seconds.
+constexpr Mapping kMappings[] = {
+    {"Identity", {0.0, 1.0, 0.0, 5.37e-3}, {0.0, 0.0, 1.0, 803457.3}},
+    {"Quadratic", {0.31, 1.0003, 1.1e-9, 5.371e-3}, {2.7, -3.1e-2, 0.9998, 17.25}},
+    {"TinyQuadratic", {1e-14, 0.9997, 2e-9, 5.36e-3}, {0.0, 1e-3, 1.0001, 17.25}},
+    {"NegativeSlopes", {-0.4, -1.0003, 1e-9, 5.371e-3}, {1.3, 0.02, -0.9998, 17.25}},
+    {"OneNegative", {0.4, 1.0003, -1e-9, 5.371e-3}, {1.3, 0.02, -0.9998, 17.25}},
+};
+class Mappings : public testing::TestWithParam<Mapping> {
+protected:
+    Mappings() {
+        std::ranges::copy(GetParam().range, fit_.RgFit);
+        std::ranges::copy(GetParam().azimuth, fit_.AzFit);
+        fit_.trg0 = 5.37e-3;
+        fit_.taz0 = 803457.3;
+        fit_.init();
+    }
+    Coregist fit_;
+};
+
+TEST_P(Mappings, AreInvertedByMasterTimes) {
+    for (double dr = -1e-4; dr <= 1e-4; dr += 1.7e-5) {
+        for (double da = -9.0; da <= 9.0; da += 1.9) {
+            double range = 0.0, azimuth = 0.0, back_range = 0.0, back_azimuth = 0.0;
+            EXPECT_EQ(fit_.evaluateSLtime(fit_.trg0 + dr, fit_.taz0 + da, &range, &azimuth), 0);
+            EXPECT_EQ(range, fit_.evaluateSLtimeRange(fit_.trg0 + dr, fit_.taz0 + da));
+            EXPECT_EQ(azimuth, fit_.evaluateSLtimeAzimuth(fit_.trg0 + dr, fit_.taz0 + da));
+            ASSERT_EQ(fit_.evaluateMAtime(range, azimuth, &back_range, &back_azimuth), 0);
+            EXPECT_NEAR(back_range, fit_.trg0 + dr, 1e-15);
+            EXPECT_NEAR(back_azimuth, fit_.taz0 + da, 5e-10);
+            EXPECT_EQ(back_range, fit_.evaluateMAtimeRange(range, azimuth));
+            EXPECT_EQ(back_azimuth, fit_.evaluateMAtimeAzimuth(range, azimuth));
+        }
+    }
+}
+
+/** The slave's sample and line by the sample form. */
+struct Pixel {
+    double sample, line;
+};
+Pixel map_samples(const Coregist& fit, double sample, double line) {
+    const double ds = sample - fit.Rg_Samples_Origin, dl = line - fit.Az_Samples_Origin;
+    const auto value = [&](const double* c) { return c[0] * ds * ds + c[1] * ds + c[2] * dl + c[3]; };
+    return {value(fit.Rg_Fit_Coeff), value(fit.Az_Fit_Coeff)};
+}
+
+void set_images(ROI_Obj& master, ROI_Obj& slave) {
+    master.SetFastAxe(5.351e-3, 1.57e-8, 9000);
+    master.SetSlowAxe(803450.1, 2.05e-3, 7000);
+    slave.SetFastAxe(5.349e-3, 1.91e-8, 8000);
+    slave.SetSlowAxe(11.5, 1.93e-3, 7500);
+}
+
+// The two forms say the same: samples to times, times by the time form, times to samples.
+TEST_P(Mappings, HaveASampleFormThatSaysTheSame) {
+    ROI_Obj master, slave;
+    set_images(master, slave);
+    ASSERT_EQ(fit_.Time2Samples(&master, &slave), 0);
+    const auto expect_agreement = [&] {
+        for (double sample = 0.0; sample < 9000.0; sample += 871.3) {
+            for (double line = 0.0; line < 7000.0; line += 791.7) {
+                double range = 0.0, azimuth = 0.0;
+                fit_.evaluateSLtime(master.FastStartTime + sample * master.FastTimeDelta,
+                                    master.SlowStartTime + line * master.SlowTimeDelta, &range, &azimuth);
+                const Pixel pixel = map_samples(fit_, sample, line);
+                EXPECT_NEAR(pixel.sample, (range - slave.FastStartTime) / slave.FastTimeDelta, 1e-5);
+                EXPECT_NEAR(pixel.line, (azimuth - slave.SlowStartTime) / slave.SlowTimeDelta,
+                            1e-5 + 1e-9 * std::abs(pixel.line));
+            }
+        }
+    };
+    expect_agreement();
+    Coregist samples;
+    fit_.clone(&samples);
+    ASSERT_EQ(fit_.ConvertPolys(&master, &slave), 0);
+    expect_agreement();
+    ASSERT_EQ(fit_.Time2Samples(&master, &slave), 0);
+    EXPECT_EQ(fit_.Rg_Samples_Origin, samples.Rg_Samples_Origin);
+    EXPECT_EQ(fit_.Az_Samples_Origin, samples.Az_Samples_Origin);
+    for (int i = 0; i < 4; ++i) {
+        EXPECT_NEAR(fit_.Rg_Fit_Coeff[i], samples.Rg_Fit_Coeff[i],
+                    1e-7 * (1e-3 + std::abs(samples.Rg_Fit_Coeff[i])));
+        EXPECT_NEAR(fit_.Az_Fit_Coeff[i], samples.Az_Fit_Coeff[i],
+                    1e-7 * (1e-3 + std::abs(samples.Az_Fit_Coeff[i])));
+    }
+}
+INSTANTIATE_TEST_SUITE_P(All, Mappings, testing::ValuesIn(kMappings),
+                         [](const auto& row) { return row.param.name; });
+
+TEST(Coregist, SixNumbersMeanCommonIntervals) {
+    ROI_Obj master, slave;
+    master.SetFastAxe(5.351e-3, 1.57e-8, 9000);
+    master.SetSlowAxe(80.1, 2.05e-3, 7000);
+    slave.SetFastAxe(5.349e-3, 1.57e-8, 8000);
+    slave.SetSlowAxe(11.5, 2.05e-3, 7500);
+    Coregist a, b;
+    for (Coregist* fit : {&a, &b}) {
+        fit->RgFit[1] = fit->AzFit[2] = 1.01;
+        fit->trg0 = 5.4e-3;
+        fit->taz0 = 83.3;
+    }
+    ASSERT_EQ(a.Time2Samples(&master, &slave), 0);
+    ASSERT_EQ(b.Time2Samples(5.351e-3, 80.1, 5.349e-3, 11.5, 1.57e-8, 2.05e-3), 0);
+    EXPECT_THAT(b.Rg_Fit_Coeff, testing::ElementsAreArray(a.Rg_Fit_Coeff));
+    EXPECT_THAT(b.Az_Fit_Coeff, testing::ElementsAreArray(a.Az_Fit_Coeff));
+    EXPECT_EQ(b.Rg_Samples_Origin, a.Rg_Samples_Origin);
+}
+
+TEST(Coregist, RefusesWhatHasNoInverse) {
+    const test::Report report;
+    const test::CapturedStderr silent;
+    Coregist fit;  // all zero
+    double range = 5.0, azimuth = 6.0;
+    EXPECT_EQ(fit.evaluateMAtime(1.0, 1.0, &range, &azimuth), 10);
+    fit.RgFit[0] = -1.0;  // a parabola that never reaches the time
+    fit.RgFit[1] = 0.1;
+    fit.AzFit[2] = 1.0;
+    fit.init();
+    EXPECT_EQ(fit.evaluateMAtime(1.0, 1.0, &range, &azimuth), 10);
+    EXPECT_EQ(range, 5.0);
+    EXPECT_EQ(azimuth, 6.0);
+    EXPECT_TRUE(std::isnan(fit.evaluateMAtimeRange(1.0, 1.0)));
+    ROI_Obj empty;
+    EXPECT_EQ(fit.Time2Samples(&empty, &empty), 1);
+    EXPECT_EQ(fit.ConvertPolys(&empty, &empty), 1);
+    EXPECT_EQ(fit.RgFit[0], -1.0);
+}
+
+const test::FieldRow kRows[] = {test::real("Az_Fit_Coeff", 0.0, 4),
+                                test::real("Rg_Fit_Coeff", 0.0, 4),
+                                test::real("RgFit", 0.0, 4).keyed("Rg_Fit_Coeff_Time"),
+                                test::real("AzFit", 0.0, 4).keyed("Az_Fit_Coeff_Time"),
+                                test::real("trg0_s", 0.0).keyed("Rg_Time_Origin"),
+                                test::real("taz0_s", 0.0).keyed("Az_Time_Origin"),
+                                test::whole("Az_Samples_Origin", 0.0),
+                                test::whole("Rg_Samples_Origin", 0.0),
+                                test::real("Rg_Fit_Coeffs_Relative_Errors", 0.0, 4).is(test::Presence::kOptional),
+                                test::real("Az_Fit_Coeffs_Relative_Errors", 0.0, 4).is(test::Presence::kOptional)};
+
+TEST(Coregist, RegistersItsFields) {
+    const Coregist fit;
+    test::expect_fields(fit, kRows);
+}
+
+TEST(Coregist, ComesBackFromAHeader) {
+    const test::Report report;
+    const std::string file = report.file("REGIST.xml");
+    Coregist written, read;
+    for (int i = 0; i < 4; ++i) {
+        written.Az_Fit_Coeff[i] = 1.25 + i;
+        written.Rg_Fit_Coeff[i] = 2.25 + i;
+        written.RgFit[i] = 3.25 + i;
+        written.AzFit[i] = 4.25 + i;
+        written.Rg_Fit_Coeffs_Relative_Errors[i] = 0.5 + i;
+        written.Az_Fit_Coeffs_Relative_Errors[i] = 0.75 + i;
+    }
+    written.trg0 = 5.25;
+    written.taz0 = 6.25;
+    written.Az_Samples_Origin = 7;
+    written.Rg_Samples_Origin = 8;
+    ASSERT_EQ(written.writepar(file.c_str()), 0);
+    ASSERT_EQ(read.readpar(file.c_str()), 0);
+    EXPECT_THAT(read.AzFit, testing::ElementsAreArray(written.AzFit));
+    EXPECT_EQ(test::values_of(*read.element(9)), test::values_of(*written.element(9)));
+    double range = 0.0, azimuth = 0.0;
+    EXPECT_EQ(read.evaluateMAtime(6.25, 7.25, &range, &azimuth), 0) << "reading prepares the inverse";
+}
+
+TEST(Coregist, ReadsAParameterFileWithItsOwnKeys) {
+    const test::Report report;
+    const test::CapturedStderr silent;
+    const std::string keys =
+        "[REGIST]\nAz_Fit_Coeff = {1 2 3 4}\nRg_Fit_Coeff = {5 6 7 8}\nAz_Fit_Coeff_Time = {9 10 11 12}\n"
+        "Rg_Fit_Coeff_Time = {13 14 15 16}\nAz_Samples_Origin = 17\nAz_Time_Origin = 19\nRg_Time_Origin = 20\n";
+    const std::string complete = report.file("complete.txt"), incomplete = report.file("incomplete.txt");
+    test::write_text(complete, keys + "Rg_Samples_Origin = 18\n");
+    test::write_text(incomplete, keys);
+    Coregist fit;
+    ASSERT_EQ(fit.readpar(complete.c_str()), 0);
+    EXPECT_THAT(fit.AzFit, ElementsAre(9, 10, 11, 12));
+    EXPECT_THAT(fit.RgFit, ElementsAre(13, 14, 15, 16));
+    EXPECT_EQ(fit.taz0, 19.0);
+    EXPECT_EQ(fit.trg0, 20.0);
+    EXPECT_EQ(fit.Rg_Samples_Origin, 18);
+    EXPECT_TRUE(report.messages("ERROR").empty());
+
+    Coregist partial;
+    EXPECT_EQ(partial.readpar(incomplete.c_str()), 1);
+    EXPECT_EQ(partial.taz0, 19.0);
+    EXPECT_THAT(report.messages("ERROR"), ElementsAre("Fit polynomials read error"));
+}
+
+}  // namespace
