@@ -134,6 +134,7 @@ inline std::vector<std::string> differing_fields(const GeneralSAR_BaseXML& a, co
 /** Names of all elements, in the order of registration. */
 inline std::vector<std::string> field_names(const GeneralSAR_BaseXML& object) {
     std::vector<std::string> names;
+    names.reserve(static_cast<std::size_t>(object.elementCount()));
     for (int i = 0; i < object.elementCount(); ++i) names.emplace_back(object.element(i)->name);
     return names;
 }
