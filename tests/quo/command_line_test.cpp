@@ -83,9 +83,7 @@ protected:
 const std::string kTable = "azimuth_time_s,range_time_s\n1167930310.25,0.0056\n";
 const std::string kFiveVectors = header_of(test::CircularOrbit{41.3, 12.8, -12.7}, {.vectors = 5});
 
-std::string without(std::string text, const std::string& part) {
-    return text.erase(text.find(part), part.size());
-}
+std::string without(std::string text, const std::string& part) { return text.erase(text.find(part), part.size()); }
 
 const FailedJob kFailedJobs[] = {
     {"EmptyHeader", " ", "", "no state vectors"},

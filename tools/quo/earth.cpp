@@ -9,9 +9,7 @@ namespace {
 constexpr double kDegree = std::numbers::pi / 180.0;
 constexpr double kE2 = 1.0 - (kSemiMinor / kSemiMajor) * (kSemiMinor / kSemiMajor);  // first eccentricity squared
 
-double dot(const Vector& a, const Vector& b) {
-    return a.v[0] * b.v[0] + a.v[1] * b.v[1] + a.v[2] * b.v[2];
-}
+double dot(const Vector& a, const Vector& b) { return a.v[0] * b.v[0] + a.v[1] * b.v[1] + a.v[2] * b.v[2]; }
 
 Vector cross(const Vector& a, const Vector& b) {
     return {
@@ -24,13 +22,9 @@ Vector operator-(const Vector& a, const Vector& b) {
     return {{a.v[0] - b.v[0], a.v[1] - b.v[1], a.v[2] - b.v[2]}};
 }
 
-double norm(const Vector& a) {
-    return std::sqrt(dot(a, a));
-}
+double norm(const Vector& a) { return std::sqrt(dot(a, a)); }
 
-double angle_deg(const Vector& a, const Vector& b) {
-    return std::atan2(norm(cross(a, b)), dot(a, b)) / kDegree;
-}
+double angle_deg(const Vector& a, const Vector& b) { return std::atan2(norm(cross(a, b)), dot(a, b)) / kDegree; }
 
 Vector normal(const Geodetic& point) {
     const double latitude = point.latitude_deg * kDegree;

@@ -9,9 +9,7 @@
 
 namespace tool {
 
-std::string system_cause() {
-    return std::generic_category().message(errno);
-}
+std::string system_cause() { return std::generic_category().message(errno); }
 
 std::string status_text(int status) {
     struct Meaning {

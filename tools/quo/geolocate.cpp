@@ -234,7 +234,7 @@ constexpr const char* kDetails =
     "  radar:  reads latitude_deg, longitude_deg, height_m and, if there, doppler_hz; adds azimuth_time_s,\n"
     "          range_time_s, status\n"
     "Points of --to ground lie on the WGS84 ellipsoid. A computed column whose name is taken gets the prefix\n"
-    "computed_.";
+    "computed_.\n";
 
 }  // namespace
 

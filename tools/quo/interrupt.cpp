@@ -9,9 +9,7 @@ namespace {
 
 volatile std::sig_atomic_t noted_signal = 0;  // a signal handler can reach nothing but a static
 
-extern "C" void note_signal(int signal) {
-    noted_signal = signal;
-}
+extern "C" void note_signal(int signal) { noted_signal = signal; }
 
 }  // namespace
 

@@ -11,7 +11,7 @@ constexpr const char* kAbout =
     "Radar geometry from the headers of synthetic aperture radar products: orbits, geolocation, times.\n"
     "Times are seconds since 1 January 1985 without leap seconds, range times are two-way.";
 constexpr const char* kFooter =
-    "Exit status: 0 fine; 1 a job that failed, rows without a solution, or findings; 2 wrong use.";
+    "Exit status: 0 fine; 1 a job that failed, rows without a solution, or findings; 2 wrong use.\n";
 
 int run(int argc, char** argv) {
     CLI::App app{kAbout, "quo"};

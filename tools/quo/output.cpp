@@ -56,9 +56,7 @@ Output::~Output() {
     if (!unfinished_.empty()) unlink(unfinished_.c_str());
 }
 
-void Output::fail() const {
-    throw Failure(name_ + ": " + system_cause());
-}
+void Output::fail() const { throw Failure(name_ + ": " + system_cause()); }
 
 void Output::write(std::string_view text) {
     throw_if_interrupted();

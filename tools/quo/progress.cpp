@@ -23,9 +23,7 @@ std::string bar(double share) {
 Progress::Progress()
     : terminal_{isatty(STDERR_FILENO) == 1}, next_{Clock::now() + std::chrono::milliseconds{500}} {}
 
-Progress::~Progress() {
-    wipe();
-}
+Progress::~Progress() { wipe(); }
 
 void Progress::show(std::int64_t done, std::int64_t in_all, std::int64_t rows) {
     if (!terminal_ || ++calls_ % kCallsPerLook != 0 || Clock::now() < next_) return;

@@ -101,8 +101,6 @@ bool Scene::covers(double time_s) const {
     return time_s >= first_time() - kLeeway && time_s <= last_time() + kLeeway;
 }
 
-std::vector<std::string> Scene::findings() const {
-    return check(orbit_);
-}
+std::vector<std::string> Scene::findings() const { return check(orbit_); }
 
 }  // namespace tool

@@ -95,8 +95,6 @@ std::optional<std::string> Table::defect() const {
     return std::nullopt;
 }
 
-std::string Table::place() const {
-    return input_.name() + ": line " + std::to_string(input_.line_number());
-}
+std::string Table::place() const { return input_.name() + ": line " + std::to_string(input_.line_number()); }
 
 }  // namespace tool

@@ -226,7 +226,7 @@ constexpr const char* kDetails =
     "Tie points are ground points whose azimuth time and range time are known. Azimuth time and slant range are\n"
     "found from the ground point, ground position and incidence angle from the times and the point's height.\n"
     "Reads azimuth_time_s, range_time_s, latitude_deg, longitude_deg, height_m and incidence_deg from\n"
-    "SCENE_tie_points.csv beside SCENE.xml.";
+    "SCENE_tie_points.csv beside SCENE.xml.\n";
 
 }  // namespace
 

@@ -1,0 +1,7 @@
+# Fails when README does not hold the example word for word.
+file(READ "${README}" readme)
+file(READ "${EXAMPLE}" example)
+string(FIND "${readme}" "```cpp\n${example}```" place)
+if(place EQUAL -1)
+    message(FATAL_ERROR "${README} does not quote ${EXAMPLE} as it stands")
+endif()

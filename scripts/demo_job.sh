@@ -1,0 +1,15 @@
+#!/bin/sh
+# The main job: geolocates the bundled real scenes and compares the result with what their producers state.
+# Usage: scripts/demo_job.sh BUILD_FOLDER
+set -eu
+cd "$(dirname "$0")/.."
+quo=$1/tools/quo/quo
+scenes=tests/data/scenes
+
+echo
+echo "Geolocation of three real scenes against their producers' own points:"
+"$quo" tiepoints "$scenes"/*.xml
+echo
+echo "One sample of the second scene, brought to the ground:"
+printf 'azimuth_time_s,range_time_s\n1133090050.25,0.0058123\n' |
+    "$quo" geolocate "$scenes/s1a_iw_grd_20201127_desc_sea.xml" --to ground
