@@ -153,15 +153,15 @@ public:
      * and builds the model anew; the new spacing is the largest that divides the span into at least four.
      *
      * Five vectors in a run follow an orbit within 0.03 mm at 10 s, but only within 0.25 m at 60 s. The new
-     * vectors come from an interpolation of order 10 or 12 in positions and velocities (of order 8 in the
-     * positions alone, given at least eight, where the velocities are not their derivative) which is below 1 mm up
-     * to 60 s. Formulas: divided differences with repeated nodes; J. Stoer and R. Bulirsch, "Introduction to
-     * Numerical Analysis", 2002, section 2.1.5.
+     * vectors come from an interpolation of order 8 in positions and velocities (given at least eight vectors
+     * whose velocities are not their positions' derivative: in the positions alone), which is well below 1 mm up
+     * to 60 s. Hermite's formula: F. B. Hildebrand, "Introduction to Numerical Analysis", 1974, section 8.2.
      * @return 0; 1 for a spacing that is not positive, without a model, or for more vectors than can be
      * counted; 7. A failure leaves the orbit as it was. */
     int SVResample(double spacing) noexcept;
-    /** Largest distance, m, between the model and the interpolation of SVResample() at the places where a run of
-     * five is worst: an estimate of the model's own error. Not-a-number without a model. */
+    /** Estimate of the model's own error, m: how far a run of five misses a smooth orbit where it is used. From
+     * the fifth differences of the positions, or with five vectors from the velocities. Not-a-number without a
+     * model. */
     double orbitFitError() const noexcept;
     /** Examines the vectors as they stand, with or without a model, and lists what is wrong with them in their
      * order. A velocity is compared with the derivative of the curve through the neighbouring vectors.

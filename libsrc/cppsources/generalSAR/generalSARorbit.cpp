@@ -36,44 +36,15 @@ std::int32_t intervals_for(double length, double spacing) noexcept {
     return wanted <= kMost ? static_cast<std::int32_t>(wanted) : 0;
 }
 
-/** Distance between a run's curve and the interpolation, `u` spacings after the run's first vector, m. */
-double distance_at(const quo::OrbitModel& model, const quo::StateInterpolation& truth, std::int32_t k,
-                   double u) noexcept {
-    double position[3], velocity[3];
-    truth.at(k + u, position, velocity);
-    return quo::norm(quo::orbit_position(model.run(k).curve(), u * model.spacing()) - quo::load(position));
-}
-
-/** Largest such distance where the run is in use. */
-double worst_distance(const quo::OrbitModel& model, const quo::StateInterpolation& truth,
-                      std::int32_t k) noexcept {
-    // Where u (u - 1) (u - 2) (u - 3) (u - 4), the shape of the error, is largest: at the ends of the part in use
-    // and half-way between its vectors; and beyond those ends where no other run takes over.
-    constexpr double kPlaces[] = {0.6, 1.456, 2.544, 3.4}, kFirst = 0.3555, kLast = 3.6445;
-    double worst = 0.0;
-    for (const double u : kPlaces) worst = std::max(worst, distance_at(model, truth, k, u));
-    if (k == 0) worst = std::max(worst, distance_at(model, truth, k, kFirst));
-    if (k == model.runs() - 1) worst = std::max(worst, distance_at(model, truth, k, kLast));
-    return worst;
-}
-
 }  // namespace
 
-Obj::GeneralSAROrbit() {
-    createElementsVector(kTable.size());
-}
+Obj::GeneralSAROrbit() { createElementsVector(kTable.size()); }
 
-Obj::GeneralSAROrbit(double lambda) : GeneralSAROrbit{} {
-    lambda_ = lambda;
-}
+Obj::GeneralSAROrbit(double lambda) : GeneralSAROrbit{} { lambda_ = lambda; }
 
-Obj::~GeneralSAROrbit() {
-    Obj::destroyBuffers();
-}
+Obj::~GeneralSAROrbit() { Obj::destroyBuffers(); }
 
-void Obj::refreshParameters() {
-    kTable.register_all(*this);
-}
+void Obj::refreshParameters() { kTable.register_all(*this); }
 
 int Obj::createBuffers() {
     quo::CallFrame frame{"GeneralSAROrbit::createBuffers", kSource};
@@ -126,18 +97,14 @@ int Obj::setLambda(double lambda) noexcept {
     return frame.success();
 }
 
-double Obj::getLambda() const noexcept {
-    return lambda_;
-}
+double Obj::getLambda() const noexcept { return lambda_; }
 
 int Obj::setLookSign(int sign) noexcept {
     look_sign_ = sign;
     return QUO_OK;
 }
 
-int Obj::getLookSign() const noexcept {
-    return look_sign_;
-}
+int Obj::getLookSign() const noexcept { return look_sign_; }
 
 int Obj::SVCreate(double timeFirst, double timeDelta, int nStateVectors) noexcept {
     quo::CallFrame frame{"GeneralSAROrbit::SVCreate", kSource};
@@ -150,18 +117,14 @@ int Obj::SVCreate(double timeFirst, double timeDelta, int nStateVectors) noexcep
     return frame.success();
 }
 
-int Obj::SVDestroy() noexcept {
-    return destroyBuffers();
-}
+int Obj::SVDestroy() noexcept { return destroyBuffers(); }
 
-bool Obj::modelReady() const noexcept {
-    return model_ && model_->ready();
-}
+bool Obj::modelReady() const noexcept { return model_ && model_->ready(); }
 
 int Obj::computeApproximateSV() noexcept {
     quo::CallFrame frame{"GeneralSAROrbit::computeApproximateSV", kSource};
+    if (model_) model_->drop();
     if (!model_ || model_->vectors() != nSV_n) return frame.fail(QUO_REFUSED, kTooFew);
-    model_->drop();
     if (!quo::OrbitModel::valid_times(t0SV_s, dtSV_s, nSV_n))
         return frame.fail(QUO_REFUSED, "The times of the state vectors are not finite or do not increase");
     if (const int status = model_->build(states_of(*this), t0SV_s)) return frame.callee(status);
@@ -205,15 +168,14 @@ int Obj::SVResample(double spacing) noexcept {
 
 double Obj::orbitFitError() const noexcept {
     quo::CallFrame frame{"GeneralSAROrbit::orbitFitError", kSource};
-    double worst = 0.0;
+    double error_m = std::numeric_limits<double>::quiet_NaN();
     if (!modelReady() || model_->vectors() != nSV_n) {
         (void)frame.fail(QUO_REFUSED, kNoModel);
-        return std::numeric_limits<double>::quiet_NaN();
+        return error_m;
     }
-    const quo::StateInterpolation truth{states_of(*this)};
-    for (std::int32_t k = 0; k < model_->runs(); ++k) worst = std::max(worst, worst_distance(*model_, truth, k));
+    error_m = quo::run_error_m(states_of(*this));
     (void)frame.success();
-    return worst;
+    return error_m;
 }
 
 int Obj::SVCheck(std::vector<SVFinding>& findings) const noexcept {
@@ -264,13 +226,9 @@ int Obj::updatePolys(double t) noexcept {
     return frame.success();
 }
 
-std::int64_t Obj::polyUpdates() const noexcept {
-    return model_ ? model_->switches() : 0;
-}
+std::int64_t Obj::polyUpdates() const noexcept { return model_ ? model_->switches() : 0; }
 
-bool Obj::isAscending() const noexcept {
-    return nSV_n > 0 && vSV_mOs && vSV_mOs[2] > 0.0;
-}
+bool Obj::isAscending() const noexcept { return nSV_n > 0 && vSV_mOs && vSV_mOs[2] > 0.0; }
 
 int Obj::computeRotationMatrix(const double v[3], double R[9], double* speed) noexcept {
     quo::CallFrame frame{"GeneralSAROrbit::computeRotationMatrix", kSource};

@@ -26,9 +26,7 @@ constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
 
 using Obj = GeneralSAROrbit;
 
-bool finite_point(const double xyz[3]) noexcept {
-    return xyz && std::isfinite(xyz[0] + xyz[1] + xyz[2]);
-}
+bool finite_point(const double xyz[3]) noexcept { return xyz && std::isfinite(xyz[0] + xyz[1] + xyz[2]); }
 
 /** What the point solvers need besides the point. */
 struct Radar {
@@ -93,9 +91,7 @@ int Obj::sat2earth(const double pos[3], const double vel[3], double range, doubl
     return frame.success();
 }
 
-int Obj::sat2earth(double t, double range, double* xyz) noexcept {
-    return sat2earth(t, range, 0.0, xyz);
-}
+int Obj::sat2earth(double t, double range, double* xyz) noexcept { return sat2earth(t, range, 0.0, xyz); }
 
 int Obj::sat2earth(double t, double range, double doppler, double* xyz) noexcept {
     quo::CallFrame frame{"GeneralSAROrbit::sat2earth", kSource};
@@ -111,34 +107,26 @@ double* Obj::sat2earth(const double pos[3], const double vel[3], double range) n
     return point_;
 }
 
-double* Obj::sat2earth(double t, double range) noexcept {
-    return sat2earth(t, range, 0.0);
-}
+double* Obj::sat2earth(double t, double range) noexcept { return sat2earth(t, range, 0.0); }
 
 double* Obj::sat2earth(double t, double range, double doppler) noexcept {
     if (sat2earth(t, range, doppler, point_)) std::fill_n(point_, 3, kNaN);
     return point_;
 }
 
-double Obj::sat2earthX(double t, double range) noexcept {
-    return sat2earthX(t, range, 0.0);
-}
+double Obj::sat2earthX(double t, double range) noexcept { return sat2earthX(t, range, 0.0); }
 double Obj::sat2earthX(double t, double range, double doppler) noexcept {
     double xyz[3] = {kNaN, kNaN, kNaN};
     sat2earth(t, range, doppler, xyz);
     return xyz[0];
 }
-double Obj::sat2earthY(double t, double range) noexcept {
-    return sat2earthY(t, range, 0.0);
-}
+double Obj::sat2earthY(double t, double range) noexcept { return sat2earthY(t, range, 0.0); }
 double Obj::sat2earthY(double t, double range, double doppler) noexcept {
     double xyz[3] = {kNaN, kNaN, kNaN};
     sat2earth(t, range, doppler, xyz);
     return xyz[1];
 }
-double Obj::sat2earthZ(double t, double range) noexcept {
-    return sat2earthZ(t, range, 0.0);
-}
+double Obj::sat2earthZ(double t, double range) noexcept { return sat2earthZ(t, range, 0.0); }
 double Obj::sat2earthZ(double t, double range, double doppler) noexcept {
     double xyz[3] = {kNaN, kNaN, kNaN};
     sat2earth(t, range, doppler, xyz);
@@ -281,9 +269,7 @@ int Obj::SVGetLatLon(double t, double range, double* latitude, double* longitude
 int Obj::SVGetAngles(double t, double range, double* incidence, double* look) noexcept {
     return SVGetAngles(t, range, 0.0, incidence, look);
 }
-int Obj::SVGetFR(double t, double range, double* rate) noexcept {
-    return SVGetFR(t, range, 0.0, rate);
-}
+int Obj::SVGetFR(double t, double range, double* rate) noexcept { return SVGetFR(t, range, 0.0, rate); }
 int Obj::SVGetSatSpeed(double t, double range, double* speed) noexcept {
     return SVGetSatSpeed(t, range, 0.0, speed);
 }
@@ -293,46 +279,34 @@ double Obj::SVGetLat(double t, double range, double doppler) noexcept {
     SVGetLatLon(t, range, doppler, &latitude, &longitude);
     return latitude;
 }
-double Obj::SVGetLat(double t, double range) noexcept {
-    return SVGetLat(t, range, 0.0);
-}
+double Obj::SVGetLat(double t, double range) noexcept { return SVGetLat(t, range, 0.0); }
 double Obj::SVGetLon(double t, double range, double doppler) noexcept {
     double latitude = kNaN, longitude = kNaN;
     SVGetLatLon(t, range, doppler, &latitude, &longitude);
     return longitude;
 }
-double Obj::SVGetLon(double t, double range) noexcept {
-    return SVGetLon(t, range, 0.0);
-}
+double Obj::SVGetLon(double t, double range) noexcept { return SVGetLon(t, range, 0.0); }
 double Obj::SVGetAnglesIncidence(double t, double range, double doppler) noexcept {
     double incidence = kNaN, look = kNaN;
     SVGetAngles(t, range, doppler, &incidence, &look);
     return incidence;
 }
-double Obj::SVGetAnglesIncidence(double t, double range) noexcept {
-    return SVGetAnglesIncidence(t, range, 0.0);
-}
+double Obj::SVGetAnglesIncidence(double t, double range) noexcept { return SVGetAnglesIncidence(t, range, 0.0); }
 double Obj::SVGetAnglesLook(double t, double range, double doppler) noexcept {
     double incidence = kNaN, look = kNaN;
     SVGetAngles(t, range, doppler, &incidence, &look);
     return look;
 }
-double Obj::SVGetAnglesLook(double t, double range) noexcept {
-    return SVGetAnglesLook(t, range, 0.0);
-}
+double Obj::SVGetAnglesLook(double t, double range) noexcept { return SVGetAnglesLook(t, range, 0.0); }
 double Obj::SVGetFR(double t, double range, double doppler) noexcept {
     double rate = kNaN;
     SVGetFR(t, range, doppler, &rate);
     return rate;
 }
-double Obj::SVGetFR(double t, double range) noexcept {
-    return SVGetFR(t, range, 0.0);
-}
+double Obj::SVGetFR(double t, double range) noexcept { return SVGetFR(t, range, 0.0); }
 double Obj::SVGetSatSpeed(double t, double range, double doppler) noexcept {
     double speed = kNaN;
     SVGetSatSpeed(t, range, doppler, &speed);
     return speed;
 }
-double Obj::SVGetSatSpeed(double t, double range) noexcept {
-    return SVGetSatSpeed(t, range, 0.0);
-}
+double Obj::SVGetSatSpeed(double t, double range) noexcept { return SVGetSatSpeed(t, range, 0.0); }

@@ -18,17 +18,11 @@ constexpr const auto& kTable = quo::kStateVectorTable<Obj>;
 
 }  // namespace
 
-Obj::SAROrbitStateVectors_Obj() {
-    createElementsVector(kTable.size());
-}
+Obj::SAROrbitStateVectors_Obj() { createElementsVector(kTable.size()); }
 
-Obj::~SAROrbitStateVectors_Obj() {
-    Obj::destroyBuffers();
-}
+Obj::~SAROrbitStateVectors_Obj() { Obj::destroyBuffers(); }
 
-void Obj::refreshParameters() {
-    kTable.register_all(*this);
-}
+void Obj::refreshParameters() { kTable.register_all(*this); }
 
 int Obj::createBuffers() {
     quo::CallFrame frame{"SAROrbitStateVectors_Obj::createBuffers", kSource};
@@ -81,9 +75,7 @@ int Obj::SVCreate(double timeFirst, double timeDelta, int nStateVectors) noexcep
     return frame.success();
 }
 
-int Obj::SVDestroy() noexcept {
-    return destroyBuffers();
-}
+int Obj::SVDestroy() noexcept { return destroyBuffers(); }
 
 int Obj::SVPolyCompute() noexcept {
     quo::CallFrame frame{"SAROrbitStateVectors_Obj::SVPolyCompute", kSource};

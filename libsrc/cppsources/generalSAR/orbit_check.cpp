@@ -24,15 +24,9 @@ constexpr double kVelocityTolerance_m_s = 1e-3;
 constexpr std::size_t kNeighbours = 4;
 constexpr std::int32_t kReach = 6;
 
-Vec3 position_of(const StateVectors& states, std::int32_t i) noexcept {
-    return load(states.position(i));
-}
-Vec3 velocity_of(const StateVectors& states, std::int32_t i) noexcept {
-    return load(states.velocity(i));
-}
-bool finite(const Vec3& v) noexcept {
-    return std::isfinite(v.x + v.y + v.z);
-}
+Vec3 position_of(const StateVectors& states, std::int32_t i) noexcept { return load(states.position(i)); }
+Vec3 velocity_of(const StateVectors& states, std::int32_t i) noexcept { return load(states.velocity(i)); }
+bool finite(const Vec3& v) noexcept { return std::isfinite(v.x + v.y + v.z); }
 
 struct Wording {
     SVFinding::Problem problem;

@@ -40,9 +40,9 @@ NodeWeights hermite_weights(std::span<const std::int32_t> nodes, double s) noexc
 /** The same from the values alone: of degree n - 1. */
 NodeWeights lagrange_weights(std::span<const std::int32_t> nodes, double s) noexcept;
 
-/** The interpolation that state vectors are re-sampled by and the 5-point model is judged by: order 12 in
- * positions and velocities (10 with five vectors), or order 8 in the positions alone where velocities that are not
- * their derivative would bend the curve by more than 0.1 mm. Needs at least five vectors. */
+/** The interpolation that state vectors are re-sampled by: of order 8, in positions and velocities of four
+ * vectors, or in the positions alone of eight where velocities that are not their derivative would bend the curve
+ * by more than 0.1 mm. Needs at least five vectors. */
 class StateInterpolation {
 public:
     explicit StateInterpolation(const StateVectors& states) noexcept;
@@ -53,6 +53,12 @@ private:
     StateVectors states_;
     bool use_velocities_;
 };
+
+/** How far a curve of degree 4 through each five vectors misses a smooth orbit where it is used: from 0.6 to 3.4
+ * spacings after its first vector, and to the orbit's own ends, m. The miss is the next term of Newton's
+ * interpolation formula, which needs a sixth vector; with five its size is read from the velocities at both ends.
+ */
+double run_error_m(const StateVectors& states) noexcept;
 
 /** Length of the difference between a vector's velocity and the derivative of the polynomial through the positions
  * of up to eight vectors around it, m/s. */

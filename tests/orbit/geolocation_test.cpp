@@ -1,0 +1,388 @@
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cmath>
+#include <limits>
+#include <string_view>
+#include <utility>
+
+#include "orbit/made_orbits.h"
+#include "support/diagnostics.h"
+#include "support/geometry.h"
+
+// The inverse on orbits whose truth is known in closed form: Dopplers of either sign, both ends, whole
+// revolutions; and what every call of geolocation refuses.
+
+namespace {
+
+using test::Vec3;
+
+constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
+constexpr double kInfinity = std::numeric_limits<double>::infinity();
+constexpr test::Times kTimes{803457.3, 9.7, 17};
+
+/** A target on the ground beside the place that the platform has above it at its time `since`. */
+Vec3 target_beside(const test::Platform& platform, double across_m) {
+    const Vec3 right = test::unit(test::cross(platform.velocity, platform.position));
+    const Vec3 p = platform.position + across_m * right;
+    return (test::kSemiMinor + 4e3) / test::norm(p) * p;
+}
+/** The Doppler with which a platform sees a target. */
+double doppler_of(const test::Platform& platform, const Vec3& target, double lambda) {
+    const Vec3 line = target - platform.position;
+    return 2.0 / lambda * test::dot(platform.velocity, line) / test::norm(line);
+}
+
+struct Heading {
+    const char* name;
+    double latitude_deg, longitude_deg, heading_deg;
+};
+constexpr Heading kHeadings[] = {
+    {"AscendingVxNegative", 41.3, 12.8, -12.7},  {"AscendingVxPositive", 41.3, -162.8, -12.7},
+    {"DescendingVxPositive", 37.1, 21.9, 192.4}, {"DescendingVxNegative", 37.1, -143.9, 192.4},
+    {"OverThePole", 88.3, 5.1, -71.0},           {"EastwardsVxNearZero", 0.0, 0.0, 90.0},
+};
+class Headings : public testing::TestWithParam<Heading> {
+protected:
+    /** The motion, in mid-orbit above the heading's place. */
+    [[nodiscard]] test::Platform state(const test::Times& times, double t) const {
+        return circle_.earth_fixed(t - 0.5 * (times.first_s + times.last()));
+    }
+    test::CircularOrbit circle_{GetParam().latitude_deg, GetParam().longitude_deg, GetParam().heading_deg};
+};
+INSTANTIATE_TEST_SUITE_P(Made, Headings, testing::ValuesIn(kHeadings),
+                         [](const auto& row) { return row.param.name; });
+
+// The first guess knows |Doppler| only and takes one side of the place abeam; at a spacing of 0.7 s the wrong one
+// lies outside the run, or outside the orbit.
+TEST_P(Headings, FindsTheTimeOfAnyDoppler) {
+    for (const test::Times& times : {kTimes, test::Times{803457.3, 0.7, 23}}) {
+        GeneralSAROrbit orbit;
+        test::make_orbit(orbit, times, [&](double t) { return state(times, t); });
+        for (int i = 1; i < 40; ++i) {
+            const double t_seen = times.first_s + i / 40.0 * (times.last() - times.first_s);
+            for (const double ahead_s : {-2.3, -0.41, 0.0, 0.41, 2.3}) {
+                for (const double across_m : {331e3, -287e3}) {
+                    const Vec3 target = target_beside(state(times, t_seen + ahead_s), across_m);
+                    const double fd = doppler_of(state(times, t_seen), target, orbit.getLambda());
+                    const double range =
+                        2.0 / test::kLightSpeed * test::norm(target - state(times, t_seen).position);
+                    SCOPED_TRACE(testing::Message() << "at " << t_seen << " s, Doppler " << fd << " Hz");
+                    double t = 0.0, tau = 0.0;
+                    EXPECT_EQ(orbit.earth2sat(target.v, &t, &tau, fd), 0);
+                    EXPECT_NEAR(t, t_seen, 2e-8);
+                    EXPECT_NEAR(tau, range, 1e-12);
+                    EXPECT_EQ(orbit.earth2satPrecise(target.v, &t, &tau, fd), 0);
+                    EXPECT_NEAR(t, t_seen, 2e-8);
+                    EXPECT_NEAR(tau, range, 1e-12);
+                }
+            }
+        }
+    }
+}
+
+struct EndCase {
+    double beyond_s;  // of the last vector, or before the first
+    bool seen;
+};
+TEST_P(Headings, CountsTheTenthOfAMillisecondBeyondTheEnds) {
+    GeneralSAROrbit orbit;
+    test::make_orbit(orbit, kTimes, [&](double t) { return state(kTimes, t); });
+    for (const EndCase& end : {EndCase{-0.3, true},
+                               {-1e-9, true},
+                               {0.0, true},
+                               {0.9e-4, true},
+                               {1.1e-4, false},
+                               {0.01, false},
+                               {47.0, false},
+                               {300.0, false}}) {
+        for (const double t_seen : {kTimes.first_s - end.beyond_s, kTimes.last() + end.beyond_s}) {
+            SCOPED_TRACE(testing::Message() << end.beyond_s << " s beyond, at " << t_seen);
+            const Vec3 target = target_beside(state(kTimes, t_seen), 331e3);
+            double t[2] = {-7.0, -7.0}, range[2] = {-8.0, -8.0};
+            EXPECT_EQ(orbit.earth2sat(target.v, &t[0], &range[0]), end.seen ? 0 : QUO_NOT_SEEN);
+            EXPECT_EQ(orbit.earth2satPrecise(target.v, &t[1], &range[1]), end.seen ? 0 : QUO_NOT_SEEN);
+            for (int i = 0; i < 2; ++i) {
+                EXPECT_NEAR(t[i], end.seen ? t_seen : -7.0, 2e-8);
+                if (!end.seen) {
+                    EXPECT_EQ(range[i], -8.0);
+                }
+            }
+            const double azimuth = orbit.earth2satAzimuth(target.v);
+            EXPECT_EQ(std::isnan(azimuth), !end.seen);
+        }
+    }
+}
+
+// The guess's steps as they are written down: the along-track frame of the whole orbit's mean velocity, the run in
+// whose middle the point lies, and the same again in that run's frame.
+double along_track_time(const double from[3], const double to[3], double flight_s, const Vec3& d, double fd,
+                        double lambda, double* range_s) {
+    double v[3], R[9], V = 0.0;
+    for (int i = 0; i < 3; ++i) v[i] = (to[i] - from[i]) / flight_s;
+    EXPECT_EQ(GeneralSAROrbit::computeRotationMatrix(v, R, &V), 0);
+    const double a = R[0] * d[0] + R[3] * d[1] + R[6] * d[2], b = R[1] * d[0] + R[4] * d[1] + R[7] * d[2];
+    const double c = R[2] * d[0] + R[5] * d[1] + R[8] * d[2];
+    double tau = a / V;
+    if (fd != 0.0) {
+        const double k = std::pow(fd * lambda / 2.0, 2.0) / (V * V), B = (k - 1.0) * a, r2 = a * a + b * b + c * c;
+        tau = (std::sqrt(B * B - (a * a - k * r2) * (1.0 - k)) - B) / (1.0 - k) / V;
+    }
+    *range_s = 2.0 * std::sqrt(std::pow(a - tau * V, 2.0) + b * b + c * c) / test::kLightSpeed;
+    return tau;
+}
+TEST_P(Headings, GuessesByItsSteps) {
+    GeneralSAROrbit orbit;
+    test::make_orbit(orbit, kTimes, [&](double t) { return state(kTimes, t); });
+    const auto position = [&](int i) { return orbit.pSV_m + 3 * static_cast<std::size_t>(i); };
+    for (const double t_seen : {-40.0, 0.0, 3.1, 21.7, 77.7, 140.1, 153.9, 260.0}) {
+        const Vec3 target = target_beside(state(kTimes, kTimes.first_s + t_seen), 331e3);
+        for (const double fd : {0.0, 812.5, -812.5}) {
+            double range = 0.0, t = 0.0, tau = 0.0;
+            const auto line_from = [&](int i) {
+                return target - Vec3{position(i)[0], position(i)[1], position(i)[2]};
+            };
+            const double first = along_track_time(position(0), position(16), 16 * kTimes.spacing_s, line_from(0),
+                                                  fd, orbit.getLambda(), &range);
+            const int m = static_cast<int>(std::clamp(std::round(first / kTimes.spacing_s) - 2.0, 0.0, 12.0));
+            const double second = along_track_time(position(m), position(m + 4), 4 * kTimes.spacing_s,
+                                                   line_from(m), fd, orbit.getLambda(), &range);
+            EXPECT_EQ(orbit.earth2satLinear(target.v, &t, &tau, fd), 0);
+            EXPECT_NEAR(t, kTimes.at(m) + second, 1e-8);
+            EXPECT_NEAR(tau, range, 1e-14);
+            if (fd == 0.0) {
+                const double with_doppler = t;
+                EXPECT_EQ(orbit.earth2satLinear(target.v, &t, &tau), 0);
+                EXPECT_EQ(t, with_doppler);
+            }
+        }
+    }
+}
+
+TEST(Earth2SatLinear, TakesAPointAbeamTheFirstVectorForTimeZero) {
+    const test::CircularOrbit circle{41.3, 12.8, -12.7};
+    GeneralSAROrbit orbit;
+    test::make_orbit(orbit, kTimes, [&](double t) { return circle.earth_fixed(t - kTimes.first_s); });
+    // Abeam of the mean flight of the first five vectors; that of all of them points to the run all the same.
+    Vec3 chord{}, start{};
+    for (std::size_t i = 0; i < 3; ++i) {
+        start[i] = orbit.pSV_m[i];
+        chord[i] = orbit.pSV_m[12 + i] - orbit.pSV_m[i];
+    }
+    const Vec3 target = start + 700e3 * test::unit(test::cross(chord, start)) +
+                        -400e3 * test::unit(test::cross(test::cross(chord, start), chord));
+    double t = 0.0, range = 0.0;
+    ASSERT_EQ(orbit.earth2satLinear(target.v, &t, &range), 0);
+    EXPECT_NEAR(t, kTimes.first_s, 1e-9);
+    EXPECT_NEAR(range, 2.0 / test::kLightSpeed * test::norm(target - start), 1e-14);
+}
+
+// Over a revolution and a half the mean velocity says nothing, and points are abeam of several passes: a near one
+// is found, never one from the far side of the Earth.
+TEST(Earth2Sat, FindsANearPassOnAnOrbitOfManyRevolutions) {
+    const test::CircularOrbit circle{41.3, 12.8, -12.7};
+    const test::Times times{803457.3, 9.7, 950};
+    const auto motion = [&](double t) { return circle.earth_fixed(t - times.first_s); };
+    GeneralSAROrbit orbit;
+    test::make_orbit(orbit, times, motion);
+    for (int i = 0; i < 60; ++i) {
+        const double t_seen = times.first_s + 5.3 + i * 153.1;
+        const Vec3 target = target_beside(motion(t_seen), i % 2 ? 331e3 : -287e3);
+        for (const bool precise : {false, true}) {
+            double t = 0.0, range = 0.0;
+            ASSERT_EQ(
+                precise ? orbit.earth2satPrecise(target.v, &t, &range) : orbit.earth2sat(target.v, &t, &range), 0);
+            const test::Platform platform = motion(t);
+            EXPECT_NEAR(doppler_of(platform, target, 0.056), 0.0, 1e-4);
+            EXPECT_LE(range, 2.0 / test::kLightSpeed * test::norm(target - motion(t_seen).position) + 1e-12);
+            EXPECT_NEAR(range, 2.0 / test::kLightSpeed * test::norm(target - platform.position), 1e-12);
+        }
+    }
+}
+
+TEST(Earth2Sat, KnowsADopplerThatTheSpeedDoesNotAllow) {
+    const test::CircularOrbit circle{41.3, 12.8, -12.7};
+    GeneralSAROrbit orbit;
+    test::make_orbit(orbit, kTimes, [&](double t) { return circle.earth_fixed(t - kTimes.first_s); });
+    const Vec3 target = target_beside(circle.earth_fixed(70.0), 331e3);
+    const double most = 2.0 / orbit.getLambda() * 7700.0;
+    double t = -7.0, range = -8.0;
+    for (const double fd : {most, -most, 10.0 * most, 1e300}) {
+        EXPECT_EQ(orbit.earth2satLinear(target.v, &t, &range, fd), QUO_NOT_SEEN);
+        EXPECT_EQ(orbit.earth2sat(target.v, &t, &range, fd), QUO_NOT_SEEN);
+        EXPECT_EQ(orbit.earth2satPrecise(target.v, &t, &range, fd), QUO_NOT_SEEN);
+    }
+    EXPECT_EQ(t + range, -15.0);
+}
+
+// --- what is refused --------------------------------------------------------------------------------------------
+
+/** One call with its inputs in `in` and its results in `out`. */
+struct Call {
+    const char* name;
+    std::size_t inputs;
+    int (*run)(GeneralSAROrbit& orbit, const double* in, double* out);
+};
+constexpr Call kCalls[] = {
+    {"SVGetPos", 1, [](auto& o, auto* in, auto* out) { return o.SVGetPos(in[0], out); }},
+    {"SVGetVel", 1, [](auto& o, auto* in, auto* out) { return o.SVGetVel(in[0], out); }},
+    {"updatePolys", 1, [](auto& o, auto* in, auto*) { return o.updatePolys(in[0]); }},
+    {"sat2earth", 3, [](auto& o, auto* in, auto* out) { return o.sat2earth(in[0], in[1], in[2], out); }},
+    {"sat2earthShort", 2, [](auto& o, auto* in, auto* out) { return o.sat2earth(in[0], in[1], out); }},
+    {"sat2earthSquinted", 3,
+     [](auto& o, auto* in, auto* out) { return o.sat2earthSquinted(in[0], in[1], in[2], out, out + 3); }},
+    {"SVGetLatLon", 3,
+     [](auto& o, auto* in, auto* out) { return o.SVGetLatLon(in[0], in[1], in[2], out, out + 1); }},
+    {"SVGetAngles", 3,
+     [](auto& o, auto* in, auto* out) { return o.SVGetAngles(in[0], in[1], in[2], out, out + 1); }},
+    {"SVGetFR", 3, [](auto& o, auto* in, auto* out) { return o.SVGetFR(in[0], in[1], in[2], out); }},
+    {"SVGetSatSpeed", 3, [](auto& o, auto* in, auto* out) { return o.SVGetSatSpeed(in[0], in[1], in[2], out); }},
+    {"earth2satLinear", 4,
+     [](auto& o, auto* in, auto* out) { return o.earth2satLinear(in, out, out + 1, 1e3 * in[3]); }},
+    {"earth2sat", 4, [](auto& o, auto* in, auto* out) { return o.earth2sat(in, out, out + 1, 1e3 * in[3]); }},
+    {"earth2satPrecise", 4,
+     [](auto& o, auto* in, auto* out) { return o.earth2satPrecise(in, out, out + 1, 1e3 * in[3]); }},
+};
+class EveryCall : public testing::TestWithParam<Call> {
+protected:
+    EveryCall() {
+        test::make_orbit(orbit_, kTimes, [this](double t) { return circle_.earth_fixed(t - kTimes.first_s); });
+        const Vec3 target = target_beside(circle_.earth_fixed(70.0), 331e3);
+        const bool from_ground = GetParam().inputs == 4;
+        const double ground[] = {target[0], target[1], target[2], 0.3};
+        const double sample[] = {kTimes.first_s + 70.0, 5.4e-3, 0.3, 0.0};
+        std::copy_n(from_ground ? ground : sample, 4, in_);
+    }
+    void expect_refused(int status) {
+        double out[4] = {1.5, 2.5, 3.5, 4.5};
+        EXPECT_EQ(GetParam().run(orbit_, in_, out), status);
+        EXPECT_EQ(out[0] + out[1] + out[2] + out[3], 12.0);
+    }
+
+    test::CircularOrbit circle_{41.3, 12.8, -12.7};
+    GeneralSAROrbit orbit_;
+    double in_[4] = {};
+};
+INSTANTIATE_TEST_SUITE_P(Of, EveryCall, testing::ValuesIn(kCalls), [](const auto& row) { return row.param.name; });
+
+TEST_P(EveryCall, RefusesWhatIsNotFinite) {
+    double out[4] = {};
+    ASSERT_EQ(GetParam().run(orbit_, in_, out), 0);
+    const test::Report report;
+    std::size_t refused = 0;
+    for (std::size_t i = 0; i < GetParam().inputs; ++i) {
+        for (const double bad : {kNaN, kInfinity, -kInfinity}) {
+            SCOPED_TRACE(testing::Message() << bad << " as input " << i);
+            const double good = std::exchange(in_[i], bad);
+            expect_refused(QUO_REFUSED);
+            EXPECT_EQ(report.entries().size(), ++refused);
+            in_[i] = good;
+        }
+    }
+    EXPECT_EQ(GetParam().run(orbit_, in_, out), 0);
+}
+
+TEST_P(EveryCall, NeedsAModel) {
+    const bool sets_minus_one = std::string_view{GetParam().name} == "earth2sat" ||
+                                std::string_view{GetParam().name} == "earth2satPrecise";
+    orbit_.SVCreate(1.5, 10.0, 6);  // made, not yet filled
+    for (int round = 0; round < 2; ++round) {
+        if (sets_minus_one) {
+            double out[4] = {};
+            EXPECT_EQ(GetParam().run(orbit_, in_, out), QUO_REFUSED);
+            EXPECT_EQ(out[0], -1.0);
+            EXPECT_EQ(out[1], -1.0);
+        } else {
+            expect_refused(QUO_REFUSED);
+        }
+        orbit_.SVDestroy();
+    }
+}
+
+TEST(EmptyOrbit, ShowsItInEveryReturnedValue) {
+    GeneralSAROrbit orbit;
+    const double xyz[3] = {4.1e6, 9.3e5, 4.7e6};
+    EXPECT_EQ(orbit.earth2satRange(xyz), -1.0);
+    EXPECT_EQ(orbit.earth2satRange(xyz[0], xyz[1], xyz[2]), -1.0);
+    EXPECT_EQ(orbit.earth2satAzimuth(xyz), -1.0);
+    EXPECT_EQ(orbit.earth2satAzimuth(xyz[0], xyz[1], xyz[2]), -1.0);
+    for (const double value :
+         {orbit.SVGetPos(1.5)[0], orbit.SVGetVel(1.5)[2], orbit.sat2earth(1.5, 5e-3)[1],
+          orbit.sat2earthX(1.5, 5e-3), orbit.SVGetLat(1.5, 5e-3), orbit.SVGetAnglesLook(1.5, 5e-3),
+          orbit.SVGetFR(1.5, 5e-3), orbit.SVGetSatSpeed(1.5, 5e-3), orbit.orbitFitError()})
+        EXPECT_TRUE(std::isnan(value));
+    EXPECT_FALSE(orbit.isAscending());
+    EXPECT_EQ(orbit.polyUpdates(), 0);
+}
+
+TEST(Sat2Earth, NamesTheGroundItCannotSee) {
+    const test::CircularOrbit circle{41.3, 12.8, -12.7};
+    GeneralSAROrbit orbit;
+    test::make_orbit(orbit, kTimes, [&](double t) { return circle.earth_fixed(t - kTimes.first_s); });
+    Vec3 p{1.5, 2.5, 3.5};
+    for (const double range : {4e-3, 5e-2}) EXPECT_EQ(orbit.sat2earth(kTimes.at(3), range, p.v), QUO_NUMERIC);
+    for (const double range : {0.0, -5.4e-3}) EXPECT_EQ(orbit.sat2earth(kTimes.at(3), range, p.v), QUO_REFUSED);
+    EXPECT_EQ(p[0] + p[1] + p[2], 7.5);
+    const test::Report report;
+    EXPECT_EQ(orbit.sat2earth(kTimes.at(3), 4e-3, p.v), QUO_NUMERIC);
+    const auto entries = report.entries("ERROR_CALL_TREE");
+    ASSERT_EQ(entries.size(), 1U);
+    EXPECT_EQ(entries[0].function, "GeneralSAROrbit::sat2earth");
+}
+
+TEST(Wavelength, MustBePositive) {
+    GeneralSAROrbit orbit{0.031};
+    EXPECT_EQ(orbit.getLambda(), 0.031);
+    for (const double bad : {0.0, -0.05, kNaN, kInfinity}) EXPECT_EQ(orbit.setLambda(bad), QUO_REFUSED);
+    EXPECT_EQ(orbit.getLambda(), 0.031);
+    EXPECT_EQ(GeneralSAROrbit{}.getLambda(), 0.05623564240544047);
+    const test::CircularOrbit circle{41.3, 12.8, -12.7};
+    GeneralSAROrbit broken{kNaN};
+    test::make_orbit(broken, kTimes, [&](double t) { return circle.earth_fixed(t - kTimes.first_s); });
+    double out[3] = {};
+    EXPECT_EQ(broken.sat2earth(kTimes.at(3), 5.4e-3, out), QUO_REFUSED);
+    const Vec3 target = target_beside(circle.earth_fixed(70.0), 331e3);
+    EXPECT_EQ(broken.earth2sat(target.v, &out[0], &out[1]), QUO_REFUSED);
+}
+
+// --- the rotation -----------------------------------------------------------------------------------------------
+
+TEST(RotationMatrix, TurnsTheVelocityAlongTheFirstAxis) {
+    const Vec3 velocities[] = {{1.7, -2.3, 0.9}, {-5031.1, 2290.7, 5180.3}, {-1.0, 0.0, 0.0}, {0.0, 3.1, -0.7},
+                               {0.0, -3.1, 0.7}, {0.0, 0.0, -7.3},          {-0.0, 0.0, 7.3}, {0.3, 0.0, 0.0}};
+    for (const Vec3& v : velocities) {
+        double R[9], speed = 0.0;
+        ASSERT_EQ(GeneralSAROrbit::computeRotationMatrix(v.v, R, &speed), 0);
+        EXPECT_DOUBLE_EQ(speed, v[0] < 0.0 ? -test::norm(v) : test::norm(v));
+        const Vec3 columns[3] = {{R[0], R[3], R[6]}, {R[1], R[4], R[7]}, {R[2], R[5], R[8]}};
+        EXPECT_NEAR(test::dot(columns[0], v), speed, 1e-12 * std::abs(speed));
+        for (int i = 0; i < 3; ++i)
+            for (int j = 0; j < 3; ++j) EXPECT_NEAR(test::dot(columns[i], columns[j]), i == j ? 1.0 : 0.0, 1e-14);
+        if (v[0] == 0.0) continue;  // the angles as they are defined
+        const double yaw = std::atan(-v[1] / v[0]), s = v[0] < 0.0 ? -1.0 : 1.0;
+        const double pitch = std::atan(-v[2] / (s * std::hypot(v[0], v[1])));
+        const double rows[9] = {std::cos(yaw) * std::cos(pitch),
+                                std::sin(yaw),
+                                std::sin(pitch) * std::cos(yaw),
+                                -std::sin(yaw) * std::cos(pitch),
+                                std::cos(yaw),
+                                -std::sin(yaw) * std::sin(pitch),
+                                -std::sin(pitch),
+                                0.0,
+                                std::cos(pitch)};
+        for (int i = 0; i < 9; ++i) EXPECT_NEAR(R[i], rows[i], 1e-15);
+    }
+}
+
+TEST(RotationMatrix, StandsStillForNoVelocityAndRefusesNone) {
+    double R[9] = {}, speed = 5.0;
+    const double still[3] = {0.0, 0.0, 0.0}, broken[3] = {1.0, kNaN, 0.0};
+    ASSERT_EQ(GeneralSAROrbit::computeRotationMatrix(still, R, &speed), 0);
+    EXPECT_EQ(speed, 0.0);
+    EXPECT_EQ(R[0] + R[4] + R[8], 3.0);
+    EXPECT_EQ(GeneralSAROrbit::computeRotationMatrix(broken, R, &speed), QUO_REFUSED);
+    EXPECT_EQ(GeneralSAROrbit::computeRotationMatrix(nullptr, R, &speed), QUO_REFUSED);
+    EXPECT_EQ(R[0] + speed, 1.0);
+}
+
+}  // namespace

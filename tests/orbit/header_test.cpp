@@ -1,0 +1,261 @@
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <filesystem>
+#include <limits>
+#include <string>
+#include <string_view>
+#include <utility>
+
+#include "orbit/made_orbits.h"
+#include "sarutillib/number_text.h"
+#include "support/diagnostics.h"
+#include "support/geometry.h"
+#include "support/scenes.h"
+
+// The orbit in header files and parameter files, whole and hostile, and its copies.
+
+namespace {
+
+using test::Vec3;
+
+constexpr test::Times kTimes{803457.3125, 9.75, 6};
+
+void fill(GeneralSAROrbit& orbit) {
+    const test::CircularOrbit circle{41.3, 12.8, -12.7};
+    test::make_orbit(orbit, kTimes, [&](double t) { return circle.earth_fixed(t - kTimes.first_s); });
+}
+
+void expect_same(GeneralSAROrbit& a, GeneralSAROrbit& b) {
+    ASSERT_EQ(a.nSV_n, b.nSV_n);
+    EXPECT_EQ(a.t0SV_s, b.t0SV_s);
+    EXPECT_EQ(a.dtSV_s, b.dtSV_s);
+    for (int i = 0; i < 3 * a.nSV_n; ++i) {
+        EXPECT_EQ(a.pSV_m[i], b.pSV_m[i]);
+        EXPECT_EQ(a.vSV_mOs[i], b.vSV_mOs[i]);
+    }
+    const double t = a.t0SV_s + 1.7 * a.dtSV_s;
+    EXPECT_EQ(test::norm(test::position_at(a, t) - test::position_at(b, t)), 0.0);
+}
+
+void expect_empty(const GeneralSAROrbit& orbit) {
+    EXPECT_EQ(orbit.pSV_m, nullptr);
+    EXPECT_EQ(orbit.vSV_mOs, nullptr);
+    EXPECT_EQ(orbit.nSV_n, 0);
+}
+
+std::string exact(double value) { return std::string{std::string_view{quo::format_exact(value)}}; }
+
+/** The orbit as a parameter file, with one line replaced: by `line`, or by nothing. */
+std::string parameter_file(const GeneralSAROrbit& orbit, const std::string& key = "",
+                           const std::string& line = "") {
+    const auto list = [&](const double* values) {
+        std::string text = "{";
+        for (int i = 0; i < 3 * orbit.nSV_n; ++i) text += (i ? " " : "") + exact(values[i]);
+        return text + "}";
+    };
+    const std::pair<std::string, std::string> keys[] = {{"TimeFirst", exact(orbit.t0SV_s)},
+                                                        {"TimeDelta", exact(orbit.dtSV_s)},
+                                                        {"nStateVectors", std::to_string(orbit.nSV_n)},
+                                                        {"pos", list(orbit.pSV_m)},
+                                                        {"vel", list(orbit.vSV_mOs)}};
+    std::string text = "[StateVectorData]\n";
+    for (const auto& [name, value] : keys) {
+        if (name == key)
+            text += line;
+        else
+            text += name + " = " + value + "\n";
+    }
+    return text;
+}
+
+/** The orbit as a header file, with the text of one element replaced. */
+std::string header_file(GeneralSAROrbit& orbit, const std::string& file, const std::string& element = "",
+                        const std::string& replacement = "") {
+    orbit.setExactNumbers(true);
+    EXPECT_EQ(orbit.writehdr(file.c_str()), 0);
+    std::string text = test::read_text(file);
+    if (element.empty()) return text;
+    const std::size_t from = text.find("<" + element + ">"), to = text.find("</" + element + ">");
+    EXPECT_NE(to, std::string::npos);
+    return text.replace(from, to + element.size() + 3 - from, replacement);
+}
+
+class Header : public testing::Test {
+protected:
+    Header() { fill(orbit_); }
+    /** A file of its own for every content: parameter files stay in memory under their names. */
+    std::string file_of(const std::string& content) {
+        const std::string name = folder_.file("header" + std::to_string(++files_));
+        test::write_text(name, content);
+        return name;
+    }
+    int read(GeneralSAROrbit& orbit, const std::string& content) {
+        return orbit.readhdr(file_of(content).c_str());
+    }
+
+    test::TemporaryFolder folder_;
+    int files_ = 0;
+    GeneralSAROrbit orbit_;
+};
+
+TEST_F(Header, ComesBackFromItsSection) {
+    GeneralSAROrbit back;
+    ASSERT_EQ(read(back, header_file(orbit_, folder_.file("out.xml"))), 0);
+    expect_same(orbit_, back);
+    SAROrbitStateVectors_Obj record;
+    ASSERT_EQ(record.readhdr(folder_.file("out.xml").c_str()), 0);
+    EXPECT_EQ(record.nSV_n, kTimes.count);
+    EXPECT_EQ(record.vSV_mOs[17], orbit_.vSV_mOs[17]);
+}
+
+TEST_F(Header, ComesBackFromAParameterFile) {
+    GeneralSAROrbit back;
+    const std::string file = file_of(parameter_file(orbit_));
+    ASSERT_EQ(back.readhdr(file.c_str()), 0);
+    expect_same(orbit_, back);
+    SAROrbitStateVectors_Obj record;
+    ASSERT_EQ(record.readhdr(file.c_str()), 0);
+    EXPECT_EQ(record.pSV_m[16], orbit_.pSV_m[16]);
+}
+
+TEST_F(Header, ListsItsElementsInOrder) {
+    const std::string text = header_file(orbit_, folder_.file("out.xml"));
+    std::size_t at = text.find("<StateVectorData>");
+    ASSERT_NE(at, std::string::npos);
+    for (const char* element : {"<pSV_m>", "<vSV_mOs>", "<t0SV_s>", "<dtSV_s>", "<nSV_n>", "</StateVectorData>"}) {
+        const std::size_t next = text.find(element);
+        ASSERT_NE(next, std::string::npos) << element;
+        EXPECT_GT(next, at) << element;
+        at = next;
+    }
+}
+
+TEST_F(Header, MissingPartsGiveFourAndAnEmptyOrbit) {
+    for (const char* key : {"TimeFirst", "TimeDelta", "nStateVectors", "pos", "vel"}) {
+        fill(orbit_);
+        const std::string content = parameter_file(orbit_, key);
+        EXPECT_EQ(read(orbit_, content), QUO_READ_FAILED) << key;
+        expect_empty(orbit_);
+    }
+    for (const char* element : {"pSV_m", "vSV_mOs", "t0SV_s", "dtSV_s", "nSV_n", "StateVectorData"}) {
+        fill(orbit_);
+        const std::string content = header_file(orbit_, folder_.file("out.xml"), element);
+        EXPECT_EQ(read(orbit_, content), QUO_READ_FAILED) << element;
+        expect_empty(orbit_);
+    }
+    const test::Report report;
+    for (const std::string& file : {folder_.file("missing"), folder_.path().string(), file_of("")}) {
+        EXPECT_EQ(orbit_.readhdr(file.c_str()), QUO_READ_FAILED);
+        EXPECT_FALSE(std::filesystem::exists(folder_.file("missing")));
+    }
+    EXPECT_EQ(orbit_.readhdr(nullptr), QUO_READ_FAILED);
+    EXPECT_EQ(report.entries("ERROR_CALL_TREE").back().function, "GeneralSAROrbit::readhdr");
+}
+
+struct HostileCount {
+    const char* name;
+    std::int64_t count;
+    int orbit_status, record_status;
+};
+// A count of which the file cannot hold the values costs no memory; fewer than five are no orbit.
+constexpr HostileCount kHostileCounts[] = {
+    {"MinusOne", -1, QUO_READ_FAILED, QUO_READ_FAILED},
+    {"Lowest", std::numeric_limits<std::int32_t>::min(), QUO_READ_FAILED, QUO_READ_FAILED},
+    {"Highest", std::numeric_limits<std::int32_t>::max(), QUO_READ_FAILED, QUO_READ_FAILED},
+    {"MostThatAreCounted", std::numeric_limits<std::int32_t>::max() / 3, QUO_READ_FAILED, QUO_READ_FAILED},
+    {"MoreThanTheFileHolds", 100000, QUO_READ_FAILED, QUO_READ_FAILED},
+    {"Unknown", -999, QUO_READ_FAILED, QUO_READ_FAILED},
+    {"None", 0, QUO_REFUSED, 0},
+    {"Four", 4, QUO_REFUSED, 0},
+};
+class Counts : public Header, public testing::WithParamInterface<HostileCount> {};
+INSTANTIATE_TEST_SUITE_P(Table, Counts, testing::ValuesIn(kHostileCounts),
+                         [](const auto& row) { return row.param.name; });
+
+TEST_P(Counts, AreJudgedBeforeTheyCount) {
+    const std::string count = std::to_string(GetParam().count);
+    const std::string header =
+        file_of(header_file(orbit_, folder_.file("out.xml"), "nSV_n", "<nSV_n>" + count + "</nSV_n>"));
+    const std::string parameters =
+        file_of(parameter_file(orbit_, "nStateVectors", "nStateVectors = " + count + "\n"));
+    for (const std::string& file : {header, parameters}) {
+        SCOPED_TRACE(file == header ? "header" : "parameter file");
+        fill(orbit_);
+        EXPECT_EQ(orbit_.readhdr(file.c_str()), GetParam().orbit_status);
+        expect_empty(orbit_);
+        double xyz[3] = {1.0, 2.0, 3.0};
+        EXPECT_EQ(orbit_.SVGetPos(803460.0, xyz), QUO_REFUSED);
+        SAROrbitStateVectors_Obj record;
+        EXPECT_EQ(record.readhdr(file.c_str()), GetParam().record_status);
+        EXPECT_EQ(record.nSV_n, GetParam().record_status ? 0 : GetParam().count);
+    }
+}
+
+TEST_F(Header, NotANumberInAPositionIsNoOrbit) {
+    orbit_.pSV_m[7] = std::numeric_limits<double>::quiet_NaN();
+    const std::string content = header_file(orbit_, folder_.file("out.xml"));
+    EXPECT_EQ(read(orbit_, content), QUO_NUMERIC);
+    expect_empty(orbit_);
+}
+
+TEST_F(Header, UnwritableFilesAreReported) {
+    const test::Report report;
+    EXPECT_NE(orbit_.writehdr((folder_.file("no") + "/such/folder.xml").c_str()), 0);
+    EXPECT_FALSE(report.entries().empty());
+    expect_same(orbit_, orbit_);
+}
+
+// Fifteen digits keep seconds since 1985 to about a microsecond: an orbit written and read moves along its track
+// by a few centimetres at most, and not at all with exact numbers.
+TEST(SceneHeader, SurvivesRewriting) {
+    for (const bool is_exact : {false, true}) {
+        for (const test::Scene& scene : test::kScenes) {
+            const test::TemporaryFolder folder;
+            GeneralSAROrbit orbit, back;
+            test::load_orbit(scene, orbit);
+            orbit.setExactNumbers(is_exact);
+            ASSERT_EQ(orbit.writehdr(folder.file("out.xml").c_str()), 0);
+            ASSERT_EQ(back.readhdr(folder.file("out.xml").c_str()), 0);
+            const double t = orbit.t0SV_s + 33.0;
+            const double moved = test::norm(test::position_at(orbit, t) - test::position_at(back, t));
+            EXPECT_LE(moved, is_exact ? 0.0 : 0.04);
+        }
+    }
+}
+
+TEST(Clone, IsACopyOfItsOwn) {
+    GeneralSAROrbit orbit{0.031}, copy;
+    fill(orbit);
+    orbit.setLookSign(-1);
+    fill(copy);
+    ASSERT_EQ(copy.SVResample(2.0), 0);  // had vectors of another number
+    ASSERT_EQ(orbit.clone(&copy), 0);
+    expect_same(orbit, copy);
+    const double t = kTimes.at(3) + 0.7, range = 5.4e-3;
+    const double latitude = orbit.SVGetLat(t, range), rate = orbit.SVGetFR(t, range);
+    orbit.SVDestroy();
+    EXPECT_EQ(copy.SVGetLat(t, range), latitude);
+    EXPECT_EQ(copy.SVGetFR(t, range), rate);
+    ASSERT_EQ(copy.clone(&copy), 0);
+    EXPECT_EQ(copy.SVGetLat(t, range), latitude);
+    ASSERT_EQ(orbit.clone(&copy), 0);
+    expect_empty(copy);
+    EXPECT_EQ(orbit.clone(nullptr), QUO_REFUSED);
+}
+
+// The clean-up of a failing caller frees what was allocated on its behalf; an orbit made meanwhile is none of
+// that.
+TEST(OrbitMemory, OutlivesAFailingCaller) {
+    const test::Report report;
+    GeneralSAROrbit orbit;
+    set_ckerr_fun("caller");
+    fill(orbit);
+    ASSERT_EQ(orbit.SVResample(3.0), 0);
+    freeall_ckerr();
+    deccurdep();
+    EXPECT_GT(test::norm(test::position_at(orbit, kTimes.at(2))), 7e6);
+    EXPECT_GT(orbit.pSV_m[0] * orbit.pSV_m[0], 0.0);
+}
+
+}  // namespace

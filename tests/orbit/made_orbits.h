@@ -1,0 +1,81 @@
+#ifndef QUO_TESTS_ORBIT_MADE_ORBITS_H
+#define QUO_TESTS_ORBIT_MADE_ORBITS_H
+
+#include <cmath>
+#include <cstddef>
+#include <stdexcept>
+
+#include "quo_base/generalSARorbit.h"
+#include "support/geometry.h"
+
+namespace test {
+
+/** An elliptic orbit in the field of a point mass, seen from the rotating Earth; eccentricity 0 is a circle. At
+ * time 0 the platform passes its perigee, above a place and with a heading as in CircularOrbit. */
+class EllipticOrbit {
+public:
+    EllipticOrbit(double latitude_deg, double longitude_deg, double heading_deg, double eccentricity)
+        : eccentricity_{eccentricity} {
+        const LocalFrame at = local_frame(latitude_deg, longitude_deg);
+        const double heading = heading_deg * kRadPerDeg;
+        outward_ = at.up;
+        along_ = std::sin(heading) * at.east + std::cos(heading) * at.north;
+    }
+    [[nodiscard]] Platform earth_fixed(double t) const { return to_earth_fixed(inertial(t), t); }
+
+private:
+    [[nodiscard]] Platform inertial(double t) const {
+        const double axis_m = (kSemiMajor + 693e3) / (1.0 - eccentricity_);
+        const double rate = std::sqrt(kGravity / axis_m) / axis_m,
+                     flat = std::sqrt(1.0 - eccentricity_ * eccentricity_);
+        double E = rate * t;  // Kepler's equation
+        for (int step = 0; step < 50; ++step)
+            E -= (E - eccentricity_ * std::sin(E) - rate * t) / (1.0 - eccentricity_ * std::cos(E));
+        const double c = std::cos(E), s = std::sin(E), E1 = rate / (1.0 - eccentricity_ * c);
+        const Vec3 position = axis_m * ((c - eccentricity_) * outward_ + flat * s * along_);
+        const Vec3 velocity = axis_m * E1 * (flat * c * along_ - s * outward_);
+        const double r = norm(position);
+        return {position, velocity, -kGravity / (r * r * r) * position};
+    }
+
+    double eccentricity_;
+    Vec3 outward_{}, along_{};
+};
+
+/** When the state vectors of a made orbit stand: uneven numbers, and half a spacing off the orbit's time 0. */
+struct Times {
+    double first_s, spacing_s;
+    int count;
+    [[nodiscard]] double at(int i) const { return first_s + i * spacing_s; }
+    [[nodiscard]] double last() const { return at(count - 1); }
+};
+
+/** Gives `orbit` the state vectors of any motion, a function of time that returns a Platform. `zero` is the
+ * motion's own time at the first vector. */
+template <typename Motion>
+void make_orbit(GeneralSAROrbit& orbit, const Times& times, const Motion& motion) {
+    if (orbit.SVCreate(times.first_s, times.spacing_s, times.count)) throw std::runtime_error{"SVCreate"};
+    for (int i = 0; i < times.count; ++i) {
+        const Platform state = motion(times.at(i));
+        for (std::size_t axis = 0; axis < 3; ++axis) {
+            orbit.pSV_m[3 * static_cast<std::size_t>(i) + axis] = state.position[axis];
+            orbit.vSV_mOs[3 * static_cast<std::size_t>(i) + axis] = state.velocity[axis];
+        }
+    }
+    if (orbit.computeApproximateSV()) throw std::runtime_error{"computeApproximateSV"};
+}
+
+inline Vec3 position_at(GeneralSAROrbit& orbit, double t) {
+    Vec3 p{};
+    if (orbit.SVGetPos(t, p.v)) throw std::runtime_error{"SVGetPos"};
+    return p;
+}
+inline Vec3 velocity_at(GeneralSAROrbit& orbit, double t) {
+    Vec3 v{};
+    if (orbit.SVGetVel(t, v.v)) throw std::runtime_error{"SVGetVel"};
+    return v;
+}
+
+}  // namespace test
+
+#endif

@@ -1,0 +1,95 @@
+#ifndef QUO_TESTS_SUPPORT_SCENES_H
+#define QUO_TESTS_SUPPORT_SCENES_H
+
+#include <cmath>
+#include <fstream>
+#include <limits>
+#include <ostream>
+#include <sstream>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+#include "quo_base/generalSARorbit.h"
+#include "quo_base/quorelxml_v2.h"
+
+namespace test {
+
+/** One of the bundled acquisitions: its header, its tie points, and what is reachable with them. */
+struct Scene {
+    const char* name;      ///< of the case
+    const char* file;      ///< below the scenes' folder, without ending
+    double time_reach_s;   ///< azimuth times of tie points and plain geometry agree within this
+    double range_reach_m;  ///< and slant ranges within this
+    double doppler_hz;     ///< a Doppler that the platform can have, for tests off broadside
+    bool geocentric;       ///< the mission's incidence is against the geocentric radius, not the normal
+    bool at_sea_level;     ///< every tie point lies on the ellipsoid
+
+    [[nodiscard]] std::string path(const char* ending) const {
+        return std::string{QUO_TEST_DATA} + "/scenes/" + file + ending;
+    }
+};
+inline std::ostream& operator<<(std::ostream& out, const Scene& scene) { return out << scene.name; }
+
+inline constexpr Scene kScenes[] = {
+    {"SatelliteAscendingRight", "s1a_iw1_slc_20220104_asc", 2.5e-6, 1e-5, 3000.0, true, false},
+    {"SatelliteDescendingRight", "s1a_iw_grd_20201127_desc_sea", 2.5e-6, 1e-5, 3000.0, true, true},
+    {"AirborneLeft", "uavsar_winnipeg_20120717_left", 2e-7, 1e-6, 300.0, false, false},
+};
+
+struct TiePoint {
+    double azimuth_time_s, range_time_s, latitude_deg, longitude_deg, height_m;
+    double incidence_deg, look_deg;  ///< as the mission defines them; the look angle may be not-a-number
+};
+
+/** The scene's orbit with its wavelength and look side, as its header tells them. */
+inline void load_orbit(const Scene& scene, GeneralSAROrbit& orbit) {
+    const std::string header = scene.path(".xml");
+    double lambda_m = 0.0;
+    std::int32_t side = 0;
+    quorelxml document{header.c_str()};
+    if (document.readDouble(1, "SamplingConstants/lambda_m", &lambda_m, 1) ||
+        document.readInt(1, "DataSetInfo/LookDirection", &side, 1) || orbit.readhdr(header.c_str()) ||
+        orbit.setLambda(lambda_m) || orbit.setLookSign(side))
+        throw std::runtime_error{"cannot read " + header};
+}
+
+/** The scene's tie points, pure geometry. */
+inline std::vector<TiePoint> load_tie_points(const Scene& scene) {
+    std::ifstream file{scene.path("_tie_points.csv")};
+    std::vector<TiePoint> points;
+    for (std::string line; std::getline(file, line);) {
+        if (line.empty() || line[0] == '#' || line[0] == 'a') continue;
+        std::istringstream cells{line};
+        double values[7];
+        std::string cell;
+        for (double& value : values) {
+            const bool found = static_cast<bool>(std::getline(cells, cell, ',')) && !cell.empty();
+            value = found ? std::stod(cell) : std::numeric_limits<double>::quiet_NaN();
+        }
+        points.push_back({values[0], values[1], values[2], values[3], values[4], values[5], values[6]});
+    }
+    if (points.empty()) throw std::runtime_error{"no tie points of " + std::string{scene.file}};
+    errno = 0;
+    return points;
+}
+
+/** The rectangle of times that the tie points cover. */
+struct Extent {
+    double first_s = std::numeric_limits<double>::infinity(), last_s = -first_s;
+    double near_s = first_s, far_s = -first_s;
+};
+inline Extent extent_of(const std::vector<TiePoint>& points) {
+    Extent extent;
+    for (const TiePoint& point : points) {
+        extent.first_s = std::min(extent.first_s, point.azimuth_time_s);
+        extent.last_s = std::max(extent.last_s, point.azimuth_time_s);
+        extent.near_s = std::min(extent.near_s, point.range_time_s);
+        extent.far_s = std::max(extent.far_s, point.range_time_s);
+    }
+    return extent;
+}
+
+}  // namespace test
+
+#endif
