@@ -126,15 +126,9 @@ fcomplex sample_of(const Chirp& chirp, int n) {
 
 }  // namespace
 
-SamplingConstants_Obj::SamplingConstants_Obj() {
-    createElementsVector(sampling::kTable.size());
-}
-void SamplingConstants_Obj::refreshParameters() {
-    sampling::kTable.register_all(*this);
-}
-int SamplingConstants_Obj::clone(SamplingConstants_Obj* to) const {
-    return sampling::kTable.copy(*this, *to);
-}
+SamplingConstants_Obj::SamplingConstants_Obj() { createElementsVector(sampling::kTable.size()); }
+void SamplingConstants_Obj::refreshParameters() { sampling::kTable.register_all(*this); }
+int SamplingConstants_Obj::clone(SamplingConstants_Obj* to) const { return sampling::kTable.copy(*this, *to); }
 int SamplingConstants_Obj::writehdr(const char* file) {
     return writeAuxiliaryFile(file, 1, sampling::kTable.section());
 }
@@ -143,18 +137,10 @@ int SamplingConstants_Obj::readhdr(const char* file) {
                                                                   : sampling::kTable.read_profile(*this, file);
 }
 
-SARPulse_Obj::SARPulse_Obj() {
-    createElementsVector(pulse::kTable.size());
-}
-void SARPulse_Obj::refreshParameters() {
-    pulse::kTable.register_all(*this);
-}
-int SARPulse_Obj::clone(SARPulse_Obj* to) const {
-    return pulse::kTable.copy(*this, *to);
-}
-int SARPulse_Obj::writehdr(const char* file) {
-    return writeAuxiliaryFile(file, 1, pulse::kTable.section());
-}
+SARPulse_Obj::SARPulse_Obj() { createElementsVector(pulse::kTable.size()); }
+void SARPulse_Obj::refreshParameters() { pulse::kTable.register_all(*this); }
+int SARPulse_Obj::clone(SARPulse_Obj* to) const { return pulse::kTable.copy(*this, *to); }
+int SARPulse_Obj::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, pulse::kTable.section()); }
 int SARPulse_Obj::readhdr(const char* file) {
     return readAuxiliaryFile(file, 1, pulse::kTable.section()) ? QUO_OK : pulse::kTable.read_profile(*this, file);
 }
@@ -175,15 +161,9 @@ int SARPulse_Obj::generateChirp(fcomplex* samples) const {
     return frame.success();
 }
 
-SensorAttitude_Obj::SensorAttitude_Obj() {
-    createElementsVector(attitude::kTable.size());
-}
-void SensorAttitude_Obj::refreshParameters() {
-    attitude::kTable.register_all(*this);
-}
-int SensorAttitude_Obj::clone(SensorAttitude_Obj* to) const {
-    return attitude::kTable.copy(*this, *to);
-}
+SensorAttitude_Obj::SensorAttitude_Obj() { createElementsVector(attitude::kTable.size()); }
+void SensorAttitude_Obj::refreshParameters() { attitude::kTable.register_all(*this); }
+int SensorAttitude_Obj::clone(SensorAttitude_Obj* to) const { return attitude::kTable.copy(*this, *to); }
 int SensorAttitude_Obj::writehdr(const char* file) {
     return writeAuxiliaryFile(file, 1, attitude::kTable.section());
 }
@@ -192,15 +172,9 @@ int SensorAttitude_Obj::readhdr(const char* file) {
                                                                   : attitude::kTable.read_profile(*this, file);
 }
 
-SpectralWindows_Obj::SpectralWindows_Obj() {
-    createElementsVector(windows::kTable.size());
-}
-void SpectralWindows_Obj::refreshParameters() {
-    windows::kTable.register_all(*this);
-}
-int SpectralWindows_Obj::clone(SpectralWindows_Obj* to) const {
-    return windows::kTable.copy(*this, *to);
-}
+SpectralWindows_Obj::SpectralWindows_Obj() { createElementsVector(windows::kTable.size()); }
+void SpectralWindows_Obj::refreshParameters() { windows::kTable.register_all(*this); }
+int SpectralWindows_Obj::clone(SpectralWindows_Obj* to) const { return windows::kTable.copy(*this, *to); }
 int SpectralWindows_Obj::writehdr(const char* file) {
     return writeAuxiliaryFile(file, 1, windows::kTable.section());
 }
@@ -209,12 +183,8 @@ int SpectralWindows_Obj::readhdr(const char* file) {
                                                                  : windows::kTable.read_profile(*this, file);
 }
 
-QuickLook_Obj::QuickLook_Obj() {
-    createElementsVector(quicklook::kTable.size());
-}
-void QuickLook_Obj::refreshParameters() {
-    quicklook::kTable.register_all(*this);
-}
+QuickLook_Obj::QuickLook_Obj() { createElementsVector(quicklook::kTable.size()); }
+void QuickLook_Obj::refreshParameters() { quicklook::kTable.register_all(*this); }
 int QuickLook_Obj::clone(QuickLook_Obj* to) const {
     to->QL_FirstSample = QL_FirstSample;
     to->QL_FirstLine = QL_FirstLine;
@@ -222,20 +192,14 @@ int QuickLook_Obj::clone(QuickLook_Obj* to) const {
     to->QL_Lines = QL_Lines;
     return QUO_OK;  // deliberate: the multilook factors of the target stay
 }
-int QuickLook_Obj::writehdr(const char* file) {
-    return writeAuxiliaryFile(file, 1, quicklook::kTable.section());
-}
+int QuickLook_Obj::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, quicklook::kTable.section()); }
 int QuickLook_Obj::readhdr(const char* file) {
     readAuxiliaryFile(file, 1, quicklook::kTable.section());
     return QUO_OK;  // deliberate: a product without a quick-look is as good as one with
 }
 
-geopoint::geopoint() {
-    createElementsVector(point::kTable.size());
-}
-void geopoint::refreshParameters() {
-    point::kTable.register_all(*this);
-}
+geopoint::geopoint() { createElementsVector(point::kTable.size()); }
+void geopoint::refreshParameters() { point::kTable.register_all(*this); }
 int geopoint::clone(geopoint* to) const {
     to->Latitude = Latitude;
     to->Longitude = Longitude;

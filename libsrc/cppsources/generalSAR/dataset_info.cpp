@@ -80,9 +80,7 @@ constexpr std::string_view kRefSystems[] = {"REFERENCE SYSTEM UNDEFINED", "WGS84
 
 using Texts = std::span<const std::string_view>;
 
-bool is_listed(Texts texts, int value) {
-    return value >= 0 && static_cast<std::size_t>(value) < texts.size();
-}
+bool is_listed(Texts texts, int value) { return value >= 0 && static_cast<std::size_t>(value) < texts.size(); }
 
 template <std::size_t Room>
 int store_text(char (&member)[Room], Texts texts, int value) {
@@ -110,40 +108,20 @@ int number_of(std::string_view text, std::span<const NumberedText> rows) {
 
 }  // namespace
 
-DataSetInfo_Obj::DataSetInfo_Obj() {
-    createElementsVector(kTable.size());
-}
-void DataSetInfo_Obj::refreshParameters() {
-    kTable.register_all(*this);
-}
-int DataSetInfo_Obj::clone(DataSetInfo_Obj* to) const {
-    return kTable.copy(*this, *to);
-}
-int DataSetInfo_Obj::writehdr(const char* file) {
-    return writeAuxiliaryFile(file, 1, kTable.section());
-}
+DataSetInfo_Obj::DataSetInfo_Obj() { createElementsVector(kTable.size()); }
+void DataSetInfo_Obj::refreshParameters() { kTable.register_all(*this); }
+int DataSetInfo_Obj::clone(DataSetInfo_Obj* to) const { return kTable.copy(*this, *to); }
+int DataSetInfo_Obj::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, kTable.section()); }
 int DataSetInfo_Obj::readhdr(const char* file) {
     return readAuxiliaryFile(file, 1, kTable.section()) ? QUO_OK : kTable.read_profile(*this, file);
 }
 
-int DataSetInfo_Obj::SetImageType(DSImageType value) {
-    return store_text(ImageType, kImageTypes, value);
-}
-int DataSetInfo_Obj::SetSensorType(DSSensorType value) {
-    return store_text(SensorName, kSensors, value);
-}
-int DataSetInfo_Obj::SetAcqMode(DSAcqMode value) {
-    return store_text(AcquisitionMode, kAcqModes, value);
-}
-int DataSetInfo_Obj::SetProjection(DSProjection value) {
-    return store_text(Projection, kProjections, value);
-}
-int DataSetInfo_Obj::SetUnitType(DSUnitType value) {
-    return store_text(UnitType, kUnitTypes, value);
-}
-int DataSetInfo_Obj::SetRefSys(DSRefSys value) {
-    return store_text(RefSystem, kRefSystems, value);
-}
+int DataSetInfo_Obj::SetImageType(DSImageType value) { return store_text(ImageType, kImageTypes, value); }
+int DataSetInfo_Obj::SetSensorType(DSSensorType value) { return store_text(SensorName, kSensors, value); }
+int DataSetInfo_Obj::SetAcqMode(DSAcqMode value) { return store_text(AcquisitionMode, kAcqModes, value); }
+int DataSetInfo_Obj::SetProjection(DSProjection value) { return store_text(Projection, kProjections, value); }
+int DataSetInfo_Obj::SetUnitType(DSUnitType value) { return store_text(UnitType, kUnitTypes, value); }
+int DataSetInfo_Obj::SetRefSys(DSRefSys value) { return store_text(RefSystem, kRefSystems, value); }
 int DataSetInfo_Obj::SetType(DSImageType image, DSSensorType sensor, DSAcqMode mode, DSProjection projection,
                              DSUnitType unit, DSRefSys system) {
     SetImageType(image);
@@ -154,24 +132,14 @@ int DataSetInfo_Obj::SetType(DSImageType image, DSSensorType sensor, DSAcqMode m
     return IsProjection(dsGeocoded) ? SetRefSys(system) : QUO_OK;
 }
 
-bool DataSetInfo_Obj::IsImageType(DSImageType value) const {
-    return holds_text(ImageType, kImageTypes, value);
-}
-bool DataSetInfo_Obj::IsSensorType(DSSensorType value) const {
-    return holds_text(SensorName, kSensors, value);
-}
-bool DataSetInfo_Obj::IsAcqMode(DSAcqMode value) const {
-    return holds_text(AcquisitionMode, kAcqModes, value);
-}
+bool DataSetInfo_Obj::IsImageType(DSImageType value) const { return holds_text(ImageType, kImageTypes, value); }
+bool DataSetInfo_Obj::IsSensorType(DSSensorType value) const { return holds_text(SensorName, kSensors, value); }
+bool DataSetInfo_Obj::IsAcqMode(DSAcqMode value) const { return holds_text(AcquisitionMode, kAcqModes, value); }
 bool DataSetInfo_Obj::IsProjection(DSProjection value) const {
     return holds_text(Projection, kProjections, value);
 }
-bool DataSetInfo_Obj::IsUnitType(DSUnitType value) const {
-    return holds_text(UnitType, kUnitTypes, value);
-}
-bool DataSetInfo_Obj::IsRefSys(DSRefSys value) const {
-    return holds_text(RefSystem, kRefSystems, value);
-}
+bool DataSetInfo_Obj::IsUnitType(DSUnitType value) const { return holds_text(UnitType, kUnitTypes, value); }
+bool DataSetInfo_Obj::IsRefSys(DSRefSys value) const { return holds_text(RefSystem, kRefSystems, value); }
 bool DataSetInfo_Obj::IsType(DSImageType image, DSSensorType sensor, DSAcqMode mode, DSProjection projection,
                              DSUnitType unit, DSRefSys system) const {
     return IsImageType(image) && IsSensorType(sensor) && IsAcqMode(mode) && IsProjection(projection) &&
@@ -182,9 +150,5 @@ int DataSetInfo_Obj::fillQUOREL() {
     quo::copy_bounded(ProcessingCenter, "QUOREL Vestra");
     return QUO_OK;
 }
-int DataSetInfo_Obj::getPolarizationNbr() const {
-    return number_of(Polarization, kPolarizations);
-}
-int DataSetInfo_Obj::getISNbr() const {
-    return number_of(Swath, kSwaths);
-}
+int DataSetInfo_Obj::getPolarizationNbr() const { return number_of(Polarization, kPolarizations); }
+int DataSetInfo_Obj::getISNbr() const { return number_of(Swath, kSwaths); }

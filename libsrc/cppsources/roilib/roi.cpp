@@ -36,9 +36,7 @@ constexpr quo::FieldTable kTable{
 }  // namespace coords
 
 /** How many intervals a length of time holds; an axis whose interval is 0 has none. */
-double intervals(double length, double delta) {
-    return delta == 0.0 ? 0.0 : length / delta;
-}
+double intervals(double length, double delta) { return delta == 0.0 ? 0.0 : length / delta; }
 
 struct Axis {
     double start, length, delta;
@@ -52,13 +50,9 @@ int shared_intervals(const Axis& a, const Axis& b, double start) {
 
 }  // namespace
 
-ROI_Obj::ROI_Obj() {
-    createElementsVector(roi::kTable.size());
-}
+ROI_Obj::ROI_Obj() { createElementsVector(roi::kTable.size()); }
 
-void ROI_Obj::refreshParameters() {
-    roi::kTable.register_all(*this);
-}
+void ROI_Obj::refreshParameters() { roi::kTable.register_all(*this); }
 
 int ROI_Obj::SetFastAxe(double start, double delta, int n) {
     FastStartTime = start;
@@ -81,41 +75,23 @@ int ROI_Obj::ResetROI() {
     return QUO_OK;
 }
 
-int ROI_Obj::isNULL() const {
-    return Samples < 1 || Lines < 1 ? 1 : 0;
-}
+int ROI_Obj::isNULL() const { return Samples < 1 || Lines < 1 ? 1 : 0; }
 
-int ROI_Obj::GetFastIndex(double time) const {
-    return GetFastRange(time - FastStartTime);
-}
+int ROI_Obj::GetFastIndex(double time) const { return GetFastRange(time - FastStartTime); }
 
-int ROI_Obj::GetSlowIndex(double time) const {
-    return GetSlowRange(time - SlowStartTime);
-}
+int ROI_Obj::GetSlowIndex(double time) const { return GetSlowRange(time - SlowStartTime); }
 
-int ROI_Obj::GetFastRange(double length) const {
-    return quo::round_clamped(intervals(length, FastTimeDelta));
-}
+int ROI_Obj::GetFastRange(double length) const { return quo::round_clamped(intervals(length, FastTimeDelta)); }
 
-int ROI_Obj::GetSlowRange(double length) const {
-    return quo::round_clamped(intervals(length, SlowTimeDelta));
-}
+int ROI_Obj::GetSlowRange(double length) const { return quo::round_clamped(intervals(length, SlowTimeDelta)); }
 
-ROI_Time ROI_Obj::GetUpLeft() const {
-    return {FastStartTime, SlowStartTime};
-}
+ROI_Time ROI_Obj::GetUpLeft() const { return {FastStartTime, SlowStartTime}; }
 
-ROI_Time ROI_Obj::GetUpRight() const {
-    return {FastStartTime, SlowStartTime + SlowTimeLength};
-}
+ROI_Time ROI_Obj::GetUpRight() const { return {FastStartTime, SlowStartTime + SlowTimeLength}; }
 
-ROI_Time ROI_Obj::GetDownLeft() const {
-    return {FastStartTime + FastTimeLength, SlowStartTime};
-}
+ROI_Time ROI_Obj::GetDownLeft() const { return {FastStartTime + FastTimeLength, SlowStartTime}; }
 
-ROI_Time ROI_Obj::GetDownRight() const {
-    return {FastStartTime + FastTimeLength, SlowStartTime + SlowTimeLength};
-}
+ROI_Time ROI_Obj::GetDownRight() const { return {FastStartTime + FastTimeLength, SlowStartTime + SlowTimeLength}; }
 
 ROI_Time ROI_Obj::GetCenter() const {
     return {FastStartTime + 0.5 * FastTimeLength, SlowStartTime + 0.5 * SlowTimeLength};
@@ -148,9 +124,7 @@ int ROI_Obj::IntersectROI(const ROI_Obj* a, const ROI_Obj* b, ROI_Obj* out) {
     return frame.success();
 }
 
-int ROI_Obj::clone(ROI_Obj* to) const {
-    return roi::kTable.copy(*this, *to);
-}
+int ROI_Obj::clone(ROI_Obj* to) const { return roi::kTable.copy(*this, *to); }
 
 int FileROI_Obj::SetFile(const char* file, const char* name) {
     quo::CallFrame frame{"FileROI_Obj::SetFile", kSource};
@@ -170,26 +144,18 @@ int FileROI_Obj::read_roi() {
     return frame.success();
 }
 
-ROI_Coords::ROI_Coords() {
-    createElementsVector(coords::kTable.size());
-}
+ROI_Coords::ROI_Coords() { createElementsVector(coords::kTable.size()); }
 
-void ROI_Coords::refreshParameters() {
-    coords::kTable.register_all(*this);
-}
+void ROI_Coords::refreshParameters() { coords::kTable.register_all(*this); }
 
 int ROI_Coords::readhdr(const char* file) {
     return readAuxiliaryFile(file, 1, coords::kTable.section()) ? QUO_OK
                                                                 : coords::kTable.read_profile(*this, file);
 }
 
-int ROI_Coords::writehdr(const char* file) {
-    return writeAuxiliaryFile(file, 1, coords::kTable.section());
-}
+int ROI_Coords::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, coords::kTable.section()); }
 
-int ROI_Coords::clone(ROI_Coords* to) const {
-    return coords::kTable.copy(*this, *to);
-}
+int ROI_Coords::clone(ROI_Coords* to) const { return coords::kTable.copy(*this, *to); }
 
 int ROI_Coords::GetROI(const ROI_Obj* image, ROI_Obj* out) const {
     quo::CallFrame frame{"ROI_Coords::GetROI", kSource};
