@@ -43,13 +43,16 @@ constexpr double kFirstRoot = 1.0, kOtherRoot = -1.0;
  * orbit, else from the nearest state vector. 0 or 12. */
 int find_times(quo::OrbitModel& model, const quo::Vec3& point, const Radar& radar, bool precise, double* t,
                double* range_s) noexcept {
-    const double lambda = radar.lambda_m, fd = radar.fd_hz;
+    const double lambda = radar.lambda_m, fd = radar.fd_hz, rate = radar.range_rate();
     quo::PointTimes guess{};
-    if (!model.long_arc() && model.linear_guess(point, radar.range_rate(), kFirstRoot, &guess)) {
-        if (precise) guess.since_first_s = model.coarse_guess(point, lambda, fd);
-        if (model.solve_near(guess.since_first_s, point, lambda, fd, t, range_s) == QUO_OK) return QUO_OK;
-        if (fd != 0.0) model.linear_guess(point, radar.range_rate(), kOtherRoot, &guess);
-        if (model.solve_anywhere(guess.since_first_s, point, lambda, fd, t, range_s) == QUO_OK) return QUO_OK;
+    if (!model.long_arc()) {
+        const bool at_hand = !precise && model.guess_on_current(point, rate, kFirstRoot, &guess.since_first_s);
+        if (at_hand || model.linear_guess(point, rate, kFirstRoot, &guess)) {
+            if (precise) guess.since_first_s = model.coarse_guess(point, lambda, fd);
+            if (model.solve_near(guess.since_first_s, point, lambda, fd, t, range_s) == QUO_OK) return QUO_OK;
+            if (fd != 0.0) model.linear_guess(point, rate, kOtherRoot, &guess);
+            if (model.solve_anywhere(guess.since_first_s, point, lambda, fd, t, range_s) == QUO_OK) return QUO_OK;
+        }
     }
     return model.solve_anywhere(model.nearest_start(point), point, lambda, fd, t, range_s);
 }

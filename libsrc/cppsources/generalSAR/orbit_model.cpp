@@ -119,12 +119,16 @@ void OrbitModel::choose(double t) noexcept {
     take(static_cast<std::int32_t>(std::clamp(k, 0.0, static_cast<double>(last))));
 }
 
+std::int32_t OrbitModel::centred_run(double spacings) const noexcept {
+    const double inside = std::clamp(spacings, 0.0, static_cast<double>(vectors()));
+    return std::clamp(static_cast<std::int32_t>(inside + 0.5) - 2, 0, runs_count_ - 1);
+}
+
 bool OrbitModel::linear_guess(const Vec3& point, double rate_m_s, double turn, PointTimes* guess) const noexcept {
-    const double coarse = mean_.time_of(point - run(0).start(), rate_m_s, turn);
-    const double middle = std::round(coarse / dt_) - 2.0;
-    if (!std::isfinite(middle)) return false;
-    const double k = std::clamp(middle, 0.0, static_cast<double>(runs_count_ - 1));
-    const OrbitRun& here = run(static_cast<std::int32_t>(k));
+    const double coarse = mean_.time_of(point - run(0).start(), rate_m_s, turn) / dt_;
+    if (!std::isfinite(coarse)) return false;
+    const std::int32_t k = centred_run(coarse);
+    const OrbitRun& here = run(k);
     const Vec3 d = point - here.start();
     const double time = here.chord.time_of(d, rate_m_s, turn);
     if (!std::isfinite(time)) return false;
@@ -157,24 +161,24 @@ int OrbitModel::solve_near(double guess_since_first_s, const Vec3& point, double
 
 int OrbitModel::solve_anywhere(double guess_since_first_s, const Vec3& point, double lambda_m, double fd_hz,
                                double* t, double* range_s) const noexcept {
-    const double length = (kRunVectors - 1) * dt_, last = runs_count_ - 1;
+    const double length = (kRunVectors - 1) * dt_;
+    const std::int32_t last = runs_count_ - 1;
     double since_first = guess_since_first_s;
     // Each turn moves on by up to a run's length: the turns suffice for any orbit and end any to and fro.
     for (std::int32_t turn = 0; turn < runs_count_ + 2; ++turn) {
-        const double k = std::clamp(std::round(since_first / dt_) - 2.0, 0.0, last);
+        const std::int32_t k = centred_run(since_first / dt_);
         double u = 0.0, tau = 0.0;
-        if (image_time(run(static_cast<std::int32_t>(k)).curve(), point,
-                       std::clamp(since_first - k * dt_, 0.0, length), {-length, 2.0 * length}, lambda_m, fd_hz,
-                       &u, &tau))
+        if (image_time(run(k).curve(), point, std::clamp(since_first - k * dt_, 0.0, length),
+                       {-length, 2.0 * length}, lambda_m, fd_hz, &u, &tau))
             return QUO_NOT_SEEN;
-        const double early = k == 0.0 ? -kEndTolerance_s : 0.0;
+        const double early = k == 0 ? -kEndTolerance_s : 0.0;
         const double late = k == last ? length + kEndTolerance_s : length;
         if (u >= early && u <= late) {
             *t = (t0_ + k * dt_) + u;
             *range_s = tau;
             return QUO_OK;
         }
-        if ((u < early && k == 0.0) || (u > late && k == last)) return QUO_NOT_SEEN;
+        if ((u < early && k == 0) || (u > late && k == last)) return QUO_NOT_SEEN;
         since_first = k * dt_ + u;
     }
     return QUO_NOT_SEEN;

@@ -108,6 +108,15 @@ public:
     /** First guess of a point's times in closed form, `turn` as in StraightFlight::time_of(). False where the
      * speed does not allow the range rate. */
     bool linear_guess(const Vec3& point, double rate_m_s, double turn, PointTimes* guess) const noexcept;
+    /** The same on the current run alone, as a time since the first vector. False unless it lies within a spacing
+     * of the run's middle. A guess in low orbit is off by about a tenth of its distance from the middle: one that
+     * near would keep the run with linear_guess() as well. Points in the order of an image mostly need no more. */
+    bool guess_on_current(const Vec3& point, double rate_m_s, double turn, double* since_first_s) const noexcept {
+        const OrbitRun& here = run(current_);
+        const double u = here.chord.time_of(point - here.start(), rate_m_s, turn);
+        *since_first_s = (tc_ - t0_) + u;
+        return dt_ <= u && u <= 3.0 * dt_;
+    }
     /** Time of a point on the coarse curve, for a first guess. */
     double coarse_guess(const Vec3& point, double lambda_m, double fd_hz) const noexcept;
     /** When the point is seen: Newton's method from a first guess, on the current run made to suit it. `t` is on
@@ -128,6 +137,8 @@ private:
         : runs_{std::move(runs)}, runs_count_{count} {}
     void choose(double t) noexcept;
     void take(std::int32_t k) noexcept;
+    /** The run with the vector nearest to a time in its middle, as far as there is one. `spacings` is finite. */
+    [[nodiscard]] std::int32_t centred_run(double spacings) const noexcept;
     int fit_runs(const StateVectors& states) noexcept;
     int fit_whole(const StateVectors& states) noexcept;
 

@@ -1,0 +1,1 @@
+quo_bench(geolocation SOURCES geolocation_bench.cpp COMPONENTS orbit)
