@@ -23,27 +23,13 @@ struct Vec3 {
     double operator[](std::size_t i) const { return v[i]; }
 };
 
-inline Vec3 operator+(const Vec3& a, const Vec3& b) {
-    return {a[0] + b[0], a[1] + b[1], a[2] + b[2]};
-}
-inline Vec3 operator-(const Vec3& a, const Vec3& b) {
-    return {a[0] - b[0], a[1] - b[1], a[2] - b[2]};
-}
-inline Vec3 operator-(const Vec3& a) {
-    return {-a[0], -a[1], -a[2]};
-}
-inline Vec3 operator*(double k, const Vec3& a) {
-    return {k * a[0], k * a[1], k * a[2]};
-}
-inline double dot(const Vec3& a, const Vec3& b) {
-    return a[0] * b[0] + a[1] * b[1] + a[2] * b[2];
-}
-inline double norm(const Vec3& a) {
-    return std::sqrt(dot(a, a));
-}
-inline Vec3 unit(const Vec3& a) {
-    return 1.0 / norm(a) * a;
-}
+inline Vec3 operator+(const Vec3& a, const Vec3& b) { return {a[0] + b[0], a[1] + b[1], a[2] + b[2]}; }
+inline Vec3 operator-(const Vec3& a, const Vec3& b) { return {a[0] - b[0], a[1] - b[1], a[2] - b[2]}; }
+inline Vec3 operator-(const Vec3& a) { return {-a[0], -a[1], -a[2]}; }
+inline Vec3 operator*(double k, const Vec3& a) { return {k * a[0], k * a[1], k * a[2]}; }
+inline double dot(const Vec3& a, const Vec3& b) { return a[0] * b[0] + a[1] * b[1] + a[2] * b[2]; }
+inline double norm(const Vec3& a) { return std::sqrt(dot(a, a)); }
+inline Vec3 unit(const Vec3& a) { return 1.0 / norm(a) * a; }
 inline Vec3 cross(const Vec3& a, const Vec3& b) {
     return {a[1] * b[2] - a[2] * b[1], a[2] * b[0] - a[0] * b[2], a[0] * b[1] - a[1] * b[0]};
 }

@@ -18,27 +18,15 @@ inline constexpr double kDegPerRad = 180.0 / std::numbers::pi;
 struct Vec3 {
     double x, y, z;
 };
-constexpr Vec3 operator+(const Vec3& a, const Vec3& b) noexcept {
-    return {a.x + b.x, a.y + b.y, a.z + b.z};
-}
-constexpr Vec3 operator-(const Vec3& a, const Vec3& b) noexcept {
-    return {a.x - b.x, a.y - b.y, a.z - b.z};
-}
-constexpr Vec3 operator*(double k, const Vec3& a) noexcept {
-    return {k * a.x, k * a.y, k * a.z};
-}
-constexpr double dot(const Vec3& a, const Vec3& b) noexcept {
-    return a.x * b.x + a.y * b.y + a.z * b.z;
-}
+constexpr Vec3 operator+(const Vec3& a, const Vec3& b) noexcept { return {a.x + b.x, a.y + b.y, a.z + b.z}; }
+constexpr Vec3 operator-(const Vec3& a, const Vec3& b) noexcept { return {a.x - b.x, a.y - b.y, a.z - b.z}; }
+constexpr Vec3 operator*(double k, const Vec3& a) noexcept { return {k * a.x, k * a.y, k * a.z}; }
+constexpr double dot(const Vec3& a, const Vec3& b) noexcept { return a.x * b.x + a.y * b.y + a.z * b.z; }
 constexpr Vec3 cross(const Vec3& a, const Vec3& b) noexcept {
     return {a.y * b.z - a.z * b.y, a.z * b.x - a.x * b.z, a.x * b.y - a.y * b.x};
 }
-inline double norm(const Vec3& a) noexcept {
-    return std::sqrt(dot(a, a));
-}
-constexpr Vec3 load(const double v[3]) noexcept {
-    return {v[0], v[1], v[2]};
-}
+inline double norm(const Vec3& a) noexcept { return std::sqrt(dot(a, a)); }
+constexpr Vec3 load(const double v[3]) noexcept { return {v[0], v[1], v[2]}; }
 constexpr void store(const Vec3& a, double v[3]) noexcept {
     v[0] = a.x;
     v[1] = a.y;
@@ -303,9 +291,7 @@ inline double incidence_deg(const Vec3& S, const Vec3& P, const Ellipsoid& e) no
 }
 
 /** Look angle: at S, between the direction to the Earth's centre and the line of sight. */
-inline double look_angle_deg(const Vec3& S, const Vec3& P) noexcept {
-    return angle_deg(-1.0 * S, P - S);
-}
+inline double look_angle_deg(const Vec3& S, const Vec3& P) noexcept { return angle_deg(-1.0 * S, P - S); }
 
 /** d(Doppler)/dt of the fixed target P. With a rotation rate other than 0 state and target are taken as inertial,
  * the target turning with the Earth. */
