@@ -79,8 +79,8 @@ public:
     TrackedBuffer() noexcept = default;
     explicit TrackedBuffer(std::size_t count) noexcept
         : data_{static_cast<T*>(calloc_ckerr(count, sizeof(T)))}, size_{data_ ? count : 0} {
-        if (!data_)
-            free_ckerr(nullptr);  // the null entry that a failed allocation leaves among the tracked blocks
+        // A failed allocation leaves a null entry among the tracked blocks.
+        if (!data_) free_ckerr(nullptr);
     }
     ~TrackedBuffer() {
         if (data_) free_ckerr(data_);

@@ -33,16 +33,16 @@ struct CallStack {
     [[nodiscard]] std::uint32_t slot() const noexcept { return std::min(depth, kCallSlots - 1); }
     [[nodiscard]] RunningCall& running() noexcept { return slots[slot()]; }
 
-    /** Enters a function. `name` is kept by address: a literal, or text that stands until the call returns. */
+    /** Enters a function. `name` is kept by address: a literal, or text that stands until the call returns. While
+     * tracking is off nobody looks, and turning it on empties the stack. */
     void push(const char* name) noexcept {
-        if (!tracking) return;
         ++depth;
         RunningCall& call = running();
         ++call.entered;
         call.name = name;
         call.serial = ++calls;
     }
-    /** Leaves a function, whether or not it was entered while tracking was on; main() is never left. */
+    /** Leaves a function; main() is never left. */
     void pop() noexcept {
         if (depth > 0) --depth;
     }

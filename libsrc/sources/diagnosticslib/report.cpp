@@ -32,14 +32,10 @@ Channel report, log_file;
 char shared_title[kTitleRoom];
 std::time_t shared_start;
 
-const char* shown(const char* text) noexcept {
-    return text ? text : "(null)";
-}
+const char* shown(const char* text) noexcept { return text ? text : "(null)"; }
 
 /** The answer to a request that names no valid level. Callers only test it for zero. */
-int one_below(int level) noexcept {
-    return level == INT_MIN ? level : level - 1;
-}
+int one_below(int level) noexcept { return level == INT_MIN ? level : level - 1; }
 
 /** EOF when the file is not open or anything written to it was lost. */
 int close_channel(Channel& channel) noexcept {
@@ -84,27 +80,26 @@ struct DateText {
     }
 };
 
+struct KindName {
+    QuoReportKind kind;
+    const char* name;
+};
+constexpr KindName kKindNames[] = {
+    {QUO_ERROR, "ERROR"},
+    {QUO_WARNING, "WARNING"},
+    {QUO_CHECKPOINT, "CHECKPOINT"},
+    {QUO_ERROR_CALL_TREE, "ERROR_CALL_TREE"},
+    {QUO_CORRECT_FUNCTION_CALL, "CORRECT_FUNCTION_CALL"},
+    {QUO_CORRECT_SYSTEM_CALL, "CORRECT_SYSTEM_CALL"},
+    {QUO_MESSAGE, "MESSAGE"},
+    {QUO_EXCEPTION, "EXCEPTION"},
+};
+
 const char* name_of(int kind) noexcept {
-    switch (kind) {
-        case QUO_ERROR:
-            return "ERROR";
-        case QUO_WARNING:
-            return "WARNING";
-        case QUO_CHECKPOINT:
-            return "CHECKPOINT";
-        case QUO_ERROR_CALL_TREE:
-            return "ERROR_CALL_TREE";
-        case QUO_CORRECT_FUNCTION_CALL:
-            return "CORRECT_FUNCTION_CALL";
-        case QUO_CORRECT_SYSTEM_CALL:
-            return "CORRECT_SYSTEM_CALL";
-        case QUO_MESSAGE:
-            return "MESSAGE";
-        case QUO_EXCEPTION:
-            return "EXCEPTION";
-        default:
-            return "UNKNOWN";
+    for (const KindName& row : kKindNames) {
+        if (row.kind == kind) return row.name;
     }
+    return "UNKNOWN";
 }
 
 struct Entry {
@@ -114,7 +109,7 @@ struct Entry {
 };
 
 void write_entry(std::FILE* stream, int number, const Entry& entry) noexcept {
-    const int elapsed_s = static_cast<int>(std::difftime(std::time(nullptr), shared_start));
+    const int elapsed_s = static_cast<int>(std::time(nullptr) - shared_start);
     if (entry.kind == QUO_ERROR) {
         std::fprintf(
             stream, "\n%d)  %s [%d sec].\n    FILE : %s.\n    FUNCTION : %s.\n    LINE : %d.\n    MESSAGE : %s.\n",
@@ -131,9 +126,7 @@ void write_entry(std::FILE* stream, int number, const Entry& entry) noexcept {
 
 }  // namespace
 
-void quo::silence_report_and_log() noexcept {
-    report.level = log_file.level = 0;
-}
+void quo::silence_report_and_log() noexcept { report.level = log_file.level = 0; }
 
 extern "C" int init_report(const char* file_name, const char* title, int level) noexcept {
     if (const auto answer = open_channel(report, file_name, title, level)) return *answer;
@@ -159,13 +152,9 @@ extern "C" int exit_report(void) noexcept {
     return report_closed != 0 ? report_closed : log_closed;
 }
 
-extern "C" int ckflg_report(void) noexcept {
-    return report.level;
-}
+extern "C" int ckflg_report(void) noexcept { return report.level; }
 
-extern "C" int set_flg_report(int level) noexcept {
-    return report.level = level;
-}
+extern "C" int set_flg_report(int level) noexcept { return report.level = level; }
 
 extern "C" void quo_add_report(const char* message, int kind, int line, const char* function,
                                const char* file) noexcept {

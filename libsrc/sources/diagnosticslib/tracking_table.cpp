@@ -33,8 +33,7 @@ bool TrackingTable::remove(void* address) noexcept {
     if (cell == kNone) return false;
     const std::uint32_t entry = cells_[cell].entry_plus_1 - 1U;
     erase_cell(cell);
-    drop_block(entries_[entry].call);
-    move_last_to(entry);
+    close_gap(entry);
     return true;
 }
 
@@ -45,11 +44,11 @@ void TrackingTable::remove_at(std::uint32_t entry) noexcept {
         flip_null(entry);
         --null_count_;
     }
-    drop_block(entries_[entry].call);
-    move_last_to(entry);
+    close_gap(entry);
 }
 
-void TrackingTable::move_last_to(std::uint32_t entry) noexcept {
+void TrackingTable::close_gap(std::uint32_t entry) noexcept {
+    drop_block(entries_[entry].call);
     const std::uint32_t last = --count_;
     if (entry == last) return;
     if (entries_[last].address) {
@@ -79,7 +78,7 @@ void TrackingTable::remove_since(std::uint64_t serial, void (*release)(void*)) n
             // `entry`.
             const std::uint32_t first = first_null();
             take(first);
-            while (first < entry && first < count_ && is_since(first, serial)) take(first);
+            while (first < count_ && is_since(first, serial)) take(first);
         }
     }
 }

@@ -79,7 +79,8 @@ private:
     void flip_null(std::uint32_t entry) noexcept { nulls_[entry / kBits] ^= std::uint64_t{1} << (entry % kBits); }
 
     void remove_at(std::uint32_t entry) noexcept;
-    void move_last_to(std::uint32_t entry) noexcept;
+    /** Moves the last entry to the place of one that is no longer in the index. */
+    void close_gap(std::uint32_t entry) noexcept;
     [[nodiscard]] bool is_since(std::uint32_t entry, std::uint64_t serial) const noexcept {
         return entries_[entry].call->serial >= serial;
     }
