@@ -1,0 +1,1 @@
+quo_bench(ckerr SOURCES ckerr_bench.cpp COMPONENTS ckerr)
