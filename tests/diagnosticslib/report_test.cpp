@@ -1,4 +1,5 @@
 #include <gmock/gmock.h>
+#include <unistd.h>
 
 #include <cerrno>
 #include <climits>
@@ -23,10 +24,8 @@ extern "C" std::time_t time(std::time_t* result) noexcept {
 
 namespace {
 
-using testing::ElementsAre;
 using testing::EndsWith;
 using testing::HasSubstr;
-using testing::IsEmpty;
 using testing::Not;
 using testing::StartsWith;
 
@@ -279,7 +278,14 @@ TEST_F(ReportFile, IsSilencedAndResumedByItsLevel) {
     EXPECT_THAT(test::read_text(name), Not(HasSubstr("dropped")));
 }
 
+int lowest_free_descriptor() {
+    const int descriptor = dup(STDOUT_FILENO);
+    close(descriptor);
+    return descriptor;
+}
+
 TEST_F(ReportFile, OpensAnotherFileBehindALevelForcedToZero) {
+    const int before = lowest_free_descriptor();
     init_report(name.c_str(), "t", 1);
     quo_add_report("a", QUO_WARNING, 1, "f", "s");
     set_flg_report(0);
@@ -287,6 +293,7 @@ TEST_F(ReportFile, OpensAnotherFileBehindALevelForcedToZero) {
     EXPECT_EQ(init_report(other.c_str(), "u", 2), 0);
     quo_add_report("b", QUO_WARNING, 1, "f", "s");
     EXPECT_EQ(exit_report(), 0);
+    EXPECT_EQ(lowest_free_descriptor(), before) << "the first file was left open";
     EXPECT_THAT(body(), Not(HasSubstr("b")));
     EXPECT_THAT(test::read_text(other), HasSubstr("\n0)  WARNING [0 sec]: b\n"));
 }
@@ -308,6 +315,14 @@ TEST_F(ReportFile, IsSilencedButNotClosedWhenTrackingStartsAnew) {
     init_ckerr_locking();
     EXPECT_EQ(ckflg_report(), 0);
     EXPECT_EQ(body(), "\n0)  WARNING [0 sec]: still written\n    . FILE s, FUNCTION f, LINE 1.\n");
+}
+
+TEST_F(ReportFile, RefusedOpeningSetsAForcedLevelBack) {
+    for (const int level : {0, 4, 1}) {  // the last is valid, but not its file
+        set_flg_report(7);
+        init_report(folder.file("missing/report.txt").c_str(), "t", level);
+        EXPECT_EQ(ckflg_report(), 0) << level;
+    }
 }
 
 // ---- System errors
