@@ -128,7 +128,7 @@ TEST(ProfileContent, SetsAKeyToAPartOfItsOwnValue) {
 }
 
 /** Every name that stands in the model, and one that does not, must be answered alike. */
-void expect_same(const ProfileContent& content, const ListModel& model) {
+void expect_same(ProfileContent& content, const ListModel& model) {
     ASSERT_EQ(content.text(), model.text());
     std::set<std::string> sections{"none"}, keys{"none"};
     for (const auto& section : model.sections) {

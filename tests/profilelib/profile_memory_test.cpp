@@ -22,12 +22,9 @@ void* operator new(std::size_t size) {
     if (void* const block = std::malloc(size)) return block;
     throw std::bad_alloc{};
 }
-void operator delete(void* block) noexcept {
-    std::free(block);
-}
-void operator delete(void* block, std::size_t) noexcept {
-    std::free(block);
-}
+// Not inlined: the compiler would take free() for the wrong partner of new.
+[[gnu::noinline]] void operator delete(void* block) noexcept { std::free(block); }
+[[gnu::noinline]] void operator delete(void* block, std::size_t) noexcept { std::free(block); }
 
 namespace {
 
@@ -37,15 +34,9 @@ struct Call {
 };
 const std::string long_name(99, 'n');
 
-void read_key(const char* file) {
-    GetSetProfileChar(0, "s", "k", nullptr, file);
-}
-void change_key(const char* file) {
-    GetSetProfileChar(1, "s", "k", long_name.c_str(), file);
-}
-void add_section(const char* file) {
-    GetSetProfileChar(1, long_name.c_str(), "k", "v", file);
-}
+void read_key(const char* file) { GetSetProfileChar(0, "s", "k", nullptr, file); }
+void change_key(const char* file) { GetSetProfileChar(1, "s", "k", long_name.c_str(), file); }
+void add_section(const char* file) { GetSetProfileChar(1, long_name.c_str(), "k", "v", file); }
 void write_back(const char* file) {
     GetSetProfileChar(1, "s", "j", "v", file);
     SyncProfile(file);

@@ -47,9 +47,7 @@ const char* get(const std::string& file, const char* key, const char* section = 
 const char* set(const std::string& file, const char* key, const char* value, const char* section = "s") {
     return GetSetProfileChar(1, section, key, value, file.c_str());
 }
-int sync(const std::string& file) {
-    return SyncProfile(file.c_str());
-}
+int sync(const std::string& file) { return SyncProfile(file.c_str()); }
 
 TEST_F(ProfileStore, MissingFileIsEmptyAndQuiet) {
     const test::Report report;

@@ -78,18 +78,10 @@ private:
 };
 
 // "int" and the 32-bit "long" are one type.
-NumberText number_text(std::int32_t value) noexcept {
-    return format_int(value);
-}
-NumberText number_text(std::int64_t value) noexcept {
-    return format_int(value);
-}
-NumberText number_text(float value) noexcept {
-    return format_general(value, kFloatDigits);
-}
-NumberText number_text(double value) noexcept {
-    return format_general(value, kDoubleDigits);
-}
+NumberText number_text(std::int32_t value) noexcept { return format_int(value); }
+NumberText number_text(std::int64_t value) noexcept { return format_int(value); }
+NumberText number_text(float value) noexcept { return format_general(value, kFloatDigits); }
+NumberText number_text(double value) noexcept { return format_general(value, kDoubleDigits); }
 
 template <typename Number>
 void append_cell(ValueText& text, Number value) noexcept {
@@ -99,15 +91,9 @@ void append_cell(ValueText& text, const char* value) noexcept {
     text.append("\"").append(text_or_empty(value)).append("\"");
 }
 
-Scanned<std::int32_t> scan(std::string_view word, std::int32_t) noexcept {
-    return scan_int32(word);
-}
-Scanned<std::int64_t> scan(std::string_view word, std::int64_t) noexcept {
-    return scan_int64(word);
-}
-Scanned<double> scan(std::string_view word, double) noexcept {
-    return scan_double(word);
-}
+Scanned<std::int32_t> scan(std::string_view word, std::int32_t) noexcept { return scan_int32(word); }
+Scanned<std::int64_t> scan(std::string_view word, std::int64_t) noexcept { return scan_int64(word); }
+Scanned<double> scan(std::string_view word, double) noexcept { return scan_double(word); }
 
 /** A float from a double; beyond the range, where a plain conversion is not defined, infinity. */
 float narrowed(double value) noexcept {

@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <utility>
 
+#include "profilelib/name_hash.h"
+
 namespace quo {
 namespace {
 
@@ -78,75 +80,84 @@ void ProfileContent::parse(std::string_view text) {
 std::string ProfileContent::text() const {
     std::string text;
     for (const Section& section : sections_) {
-        text.append("\n[").append(section.namesakes->first).append("]\n");
+        text.append("\n[").append(section.name).append("]\n");
         for (const Key& key : section.keys) text.append(key.name).append(" = ").append(key.value).append("\n");
     }
     return text;
 }
 
-const char* ProfileContent::find(std::string_view section, std::string_view key) const {
-    const auto namesakes = by_name_.find(section);
-    if (namesakes == by_name_.end()) return nullptr;
-    const auto entry = namesakes->second.found_keys.find(key);
-    return entry == namesakes->second.found_keys.end() ? nullptr : entry->second->value.c_str();
+const char* ProfileContent::find(std::string_view section, std::string_view key) {
+    const KeySlot* const found = find_key(section, key);
+    return found ? found->place->value.c_str() : nullptr;
 }
 
 const char* ProfileContent::set(std::string_view section, std::string_view key, std::string_view value) {
-    const auto namesakes = by_name_.find(section);
-    if (namesakes == by_name_.end()) return add_key(add_section(section), key, value);
-    auto& [sections, found_keys] = namesakes->second;
-    const auto entry = found_keys.find(key);
+    const SectionSlot* const known = find_section(section);
+    const SectionPlace newest = known ? known->place : add_section(section);
+    const KeySlot* const found = find_key(section, key);
     // Deliberate: a key that only an earlier section of the name holds is not changed but hidden by a new one.
-    if (entry == found_keys.end() || entry->second->section != sections.back())
-        return add_key(sections.back(), key, value);
+    if (!found || found->place->section != newest) return add_key(newest, key, value);
     std::string copy{value};
-    entry->second->value.swap(copy);
-    return entry->second->value.c_str();
+    found->place->value.swap(copy);
+    return found->place->value.c_str();
 }
 
 void ProfileContent::erase_key(std::string_view section, std::string_view key) {
-    const auto namesakes = by_name_.find(section);
-    if (namesakes == by_name_.end()) return;
-    auto& [sections, found_keys] = namesakes->second;
-    const auto entry = found_keys.find(key);
+    const SectionSlot* const newest = find_section(section);
+    KeySlot* const found = find_key(section, key);
     // Deliberate: earlier sections of the name are not searched.
-    if (entry != found_keys.end() && entry->second->section == sections.back()) remove_found(found_keys, entry);
+    if (found && found->place->section == newest->place) remove_found(found);
 }
 
 void ProfileContent::erase_section(std::string_view section) {
-    const auto namesakes = by_name_.find(section);
-    if (namesakes == by_name_.end()) return;
-    auto& [sections, found_keys] = namesakes->second;
-    const SectionPlace newest = sections.back();
+    SectionSlot* const slot = find_section(section);
+    if (!slot) return;
+    const SectionPlace newest = slot->place;
     // From the last to the first, each key is the one that a search finds.
-    while (!newest->keys.empty()) remove_found(found_keys, found_keys.find(newest->keys.back().name));
+    while (!newest->keys.empty()) remove_found(find_key(section, newest->keys.back().name));
+    if (newest->hidden)
+        slot->place = *newest->hidden;
+    else
+        newest_sections_.remove(slot);
     sections_.erase(newest);
-    sections.pop_back();
-    if (sections.empty()) by_name_.erase(namesakes);
+}
+
+ProfileContent::SectionSlot* ProfileContent::find_section(std::string_view name) {
+    return newest_sections_.find(NameHash{}.add(name).value(),
+                                 [name](SectionPlace section) { return section->name == name; });
+}
+
+ProfileContent::KeySlot* ProfileContent::find_key(std::string_view section, std::string_view name) {
+    return found_keys_.find(NameHash{}.add(section).add(name).value(), [section, name](KeyPlace key) {
+        return key->name == name && key->section->name == section;
+    });
 }
 
 ProfileContent::SectionPlace ProfileContent::add_section(std::string_view name) {
-    auto namesakes = by_name_.find(name);
-    if (namesakes == by_name_.end()) namesakes = by_name_.try_emplace(std::string{name}).first;
-    const SectionPlace section = sections_.insert(sections_.end(), Section{&*namesakes, {}});
-    namesakes->second.sections.push_back(section);
+    const SectionPlace section = sections_.insert(sections_.end(), Section{std::string{name}, {}, {}});
+    if (SectionSlot* const slot = find_section(name))
+        section->hidden = std::exchange(slot->place, section);
+    else
+        newest_sections_.add(NameHash{}.add(name).value(), section);
     return section;
 }
 
 const char* ProfileContent::add_key(SectionPlace section, std::string_view name, std::string_view value) {
-    const auto [entry, first] = section->namesakes->second.found_keys.try_emplace(std::string{name});
-    const auto hidden = first ? std::nullopt : std::optional{entry->second};
-    entry->second =
-        section->keys.insert(section->keys.end(), Key{entry->first, std::string{value}, section, hidden});
-    return entry->second->value.c_str();
+    std::list<Key>& keys = section->keys;
+    const KeyPlace key = keys.insert(keys.end(), Key{std::string{name}, std::string{value}, section, {}});
+    if (KeySlot* const slot = find_key(section->name, name))
+        key->hidden = std::exchange(slot->place, key);
+    else
+        found_keys_.add(NameHash{}.add(section->name).add(name).value(), key);
+    return key->value.c_str();
 }
 
-void ProfileContent::remove_found(Index<KeyPlace>& found_keys, Index<KeyPlace>::iterator entry) {
-    const KeyPlace key = entry->second;
+void ProfileContent::remove_found(KeySlot* slot) {
+    const KeyPlace key = slot->place;
     if (key->hidden)
-        entry->second = *key->hidden;
+        slot->place = *key->hidden;
     else
-        found_keys.erase(entry);
+        found_keys_.remove(slot);
     key->section->keys.erase(key);
 }
 

@@ -1,13 +1,12 @@
 #ifndef QUO_PROFILE_CONTENT_H
 #define QUO_PROFILE_CONTENT_H
 
-#include <functional>
 #include <list>
 #include <optional>
 #include <string>
 #include <string_view>
-#include <unordered_map>
-#include <vector>
+
+#include "profilelib/place_table.h"
 
 namespace quo {
 
@@ -31,7 +30,7 @@ public:
     [[nodiscard]] std::string text() const;
 
     /** Value of the last such key in the last section of the name that holds it, or null. */
-    [[nodiscard]] const char* find(std::string_view section, std::string_view key) const;
+    [[nodiscard]] const char* find(std::string_view section, std::string_view key);
     /** Sets the key in the newest section of the name, adding what is missing. `value` may be a stored value. */
     const char* set(std::string_view section, std::string_view key, std::string_view value);
     /** Removes the newest such key of the newest section of the name, if that section holds it. */
@@ -40,41 +39,33 @@ public:
     void erase_section(std::string_view section);
 
 private:
-    struct TextHash {
-        using is_transparent = void;
-        // Deliberately not noexcept: the map then keeps each entry's hash instead of computing it again and again.
-        std::size_t operator()(std::string_view text) const { return std::hash<std::string_view>{}(text); }
-    };
-    template <typename Value>
-    using Index = std::unordered_map<std::string, Value, TextHash, std::equal_to<>>;
-
     struct Section;
     struct Key;
     using SectionPlace = std::list<Section>::iterator;
     using KeyPlace = std::list<Key>::iterator;
 
     struct Key {
-        std::string_view name;  // stands in the index
-        std::string value;
+        std::string name, value;
         SectionPlace section;
         std::optional<KeyPlace> hidden;  // the key that a search would find if this one were not there
     };
-    /** All sections of one name. */
-    struct Namesakes {
-        std::vector<SectionPlace> sections;  // in file order: the newest last
-        Index<KeyPlace> found_keys;          // what a search for the key's name finds
-    };
     struct Section {
-        Index<Namesakes>::value_type* namesakes;  // the entry that holds this section's name
-        std::list<Key> keys;                      // in file order
+        std::string name;
+        std::list<Key> keys;                 // in file order
+        std::optional<SectionPlace> hidden;  // the section of the same name before this one
     };
+    using SectionSlot = PlaceTable<SectionPlace>::Slot;
+    using KeySlot = PlaceTable<KeyPlace>::Slot;
 
+    SectionSlot* find_section(std::string_view name);
+    KeySlot* find_key(std::string_view section, std::string_view name);
     SectionPlace add_section(std::string_view name);
     const char* add_key(SectionPlace section, std::string_view name, std::string_view value);
-    static void remove_found(Index<KeyPlace>& found_keys, Index<KeyPlace>::iterator entry);
+    void remove_found(KeySlot* slot);
 
-    std::list<Section> sections_;  // in file order
-    Index<Namesakes> by_name_;
+    std::list<Section> sections_;               // in file order
+    PlaceTable<SectionPlace> newest_sections_;  // by name
+    PlaceTable<KeyPlace> found_keys_;           // by the names of section and key: what a search finds
 };
 
 }  // namespace quo

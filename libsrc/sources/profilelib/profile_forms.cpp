@@ -14,7 +14,7 @@ constexpr std::size_t kDecimalRoom = 320;
 
 /** Ends the process with the message about a failed accessor. Some messages show a value, after a label. */
 [[noreturn]] void end_failed_check(const char* named, const char* section, const char* key, const char* file,
-                              const char* label = "", const char* value = "") {
+                                   const char* label = "", const char* value = "") {
     const auto shown = [](const char* text) { return text ? text : ""; };
     std::fprintf(stderr, "Error in %s: section %s, key %s, %s%s%sfile %s\n", named, shown(section), shown(key),
                  label, shown(value), *label ? ", " : "", shown(file));

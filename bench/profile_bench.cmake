@@ -1,0 +1,1 @@
+quo_bench(profile SOURCES profile_bench.cpp COMPONENTS profile)

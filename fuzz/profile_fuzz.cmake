@@ -1,0 +1,1 @@
+quo_fuzz(profile SOURCES profile_fuzz.cpp COMPONENTS profile)
