@@ -11,6 +11,7 @@
 #include <csignal>
 #include <cstdint>
 #include <filesystem>
+#include <limits>
 #include <string>
 
 #include "support/diagnostics.h"
@@ -31,15 +32,6 @@ mode_t mode_of(const std::string& name) {
     return found.st_mode & 07777;
 }
 
-std::size_t entries(const fs::path& folder) {
-    return static_cast<std::size_t>(std::distance(fs::directory_iterator{folder}, fs::directory_iterator{}));
-}
-
-bool replace(const std::string& name, std::string_view content) {
-    AtomicFile file{name.c_str()};
-    return file.write(content) && file.commit();
-}
-
 /** Makes writes beyond a file size fail, as a full disk would. */
 class FileSizeLimit {
 public:
@@ -58,15 +50,6 @@ public:
 private:
     void (*ignored_)(int);
     rlimit before_{};
-};
-
-/** Drops the superuser's rights as long as it lives. */
-class OrdinaryUser {
-public:
-    OrdinaryUser() { EXPECT_EQ(seteuid(getuid() == 0 ? 65534 : getuid()), 0); }
-    ~OrdinaryUser() { EXPECT_EQ(seteuid(getuid()), 0); }
-    OrdinaryUser(const OrdinaryUser&) = delete;
-    OrdinaryUser& operator=(const OrdinaryUser&) = delete;
 };
 
 TEST(ReadFile, ReadsUpToItsLimit) {
@@ -105,185 +88,169 @@ TEST(ReadFile, ReadsWhatHasNoLength) {
 
 TEST(ReadFile, GivesNothingWhereNothingCanBeRead) {
     const TemporaryFolder folder;
-    struct Case {
-        std::string name;
-        int error;
-    };
-    for (const auto& [name, error] : {Case{folder.file("missing"), ENOENT}, Case{folder.file(""), EISDIR}}) {
-        EXPECT_EQ(quo::read_file(name.c_str(), kNoLimit), std::nullopt);
-        EXPECT_EQ(errno, error);
-        EXPECT_EQ(quo::file_length(name.c_str()), std::nullopt);
-    }
+    EXPECT_EQ(quo::read_file(folder.file("missing").c_str(), kNoLimit), std::nullopt);
+    EXPECT_EQ(errno, ENOENT);
+    EXPECT_EQ(quo::read_file(folder.file("").c_str(), kNoLimit), std::nullopt);
+    EXPECT_EQ(errno, EISDIR);
     EXPECT_EQ(quo::read_file(nullptr, kNoLimit), std::nullopt);
-    EXPECT_EQ(quo::file_length(nullptr), std::nullopt);
-    // More than any memory: a status, not an end of the process.
-    write_text(folder.file("sparse"), "");
-    fs::resize_file(folder.file("sparse"), std::uintmax_t{1} << 43);
-    EXPECT_EQ(quo::file_length(folder.file("sparse").c_str()), std::int64_t{1} << 43);
     errno = 0;
 }
 
-TEST(AtomicFile, ReplacesAFileInOneStep) {
+TEST(FileLength, IsThatOfARegularFile) {
     const TemporaryFolder folder;
-    const std::string name = folder.file("header.xml");
-    write_text(name, "old");
+    write_text(folder.file("sparse"), "");
+    fs::resize_file(folder.file("sparse"), std::uintmax_t{1} << 43);
+    EXPECT_EQ(quo::file_length(folder.file("sparse").c_str()), std::int64_t{1} << 43);
+    for (const std::string& name : {folder.file(""), folder.file("missing"), std::string{"/dev/null"}})
+        EXPECT_EQ(quo::file_length(name.c_str()), std::nullopt);
+    EXPECT_EQ(quo::file_length(nullptr), std::nullopt);
+    errno = 0;
+}
+
+/** A folder with an old header in it. */
+class AtomicFileTest : public testing::Test {
+protected:
+    AtomicFileTest() { write_text(name_, "old"); }
+    void TearDown() override { errno = 0; }
+
+    static bool replace(const std::string& name, std::string_view content) {
+        AtomicFile file{name.c_str()};
+        return file.write(content) && file.commit();
+    }
+    /** The header holds `content`, and `others` entries stand beside it. */
+    void expect_header(std::string_view content, std::ptrdiff_t others = 0) const {
+        EXPECT_EQ(read_text(name_), content);
+        EXPECT_EQ(std::distance(fs::directory_iterator{folder_.path()}, fs::directory_iterator{}), 1 + others);
+    }
+
+    const TemporaryFolder folder_;
+    const std::string name_ = folder_.file("header.xml");
+};
+
+TEST_F(AtomicFileTest, ReplacesAFileInOneStep) {
     errno = EIO;
-    AtomicFile file{name.c_str()};
+    AtomicFile file{name_.c_str()};
     ASSERT_TRUE(file.good());
     EXPECT_TRUE(file.write("new "));
     EXPECT_EQ(::write(file.descriptor(), "con", 3), 3);
     EXPECT_TRUE(file.write("tent"));
-    EXPECT_EQ(read_text(name), "old");
+    expect_header("old", 1);
     EXPECT_TRUE(file.commit());
     EXPECT_EQ(errno, 0);
-    EXPECT_EQ(read_text(name), "new content");
-    EXPECT_EQ(entries(folder.path()), 1U);
+    expect_header("new content");
 
     EXPECT_FALSE(file.good());
     EXPECT_EQ(file.descriptor(), -1);
     EXPECT_FALSE(file.write("more"));
     EXPECT_FALSE(file.commit());
-    EXPECT_EQ(read_text(name), "new content");
-    errno = 0;
+    expect_header("new content");
 }
 
-TEST(AtomicFile, LeavesNothingBehindWithoutACommit) {
-    const TemporaryFolder folder;
-    const std::string name = folder.file("header.xml");
-    write_text(name, "old");
-    EXPECT_TRUE((AtomicFile{name.c_str()}.write("new")));
-    EXPECT_TRUE((AtomicFile{folder.file("other.xml").c_str()}.write("new")));
-    EXPECT_EQ(read_text(name), "old");
-    EXPECT_EQ(entries(folder.path()), 1U);
+TEST_F(AtomicFileTest, LeavesNothingBehindWithoutACommit) {
+    EXPECT_TRUE((AtomicFile{name_.c_str()}.write("new")));
+    EXPECT_TRUE((AtomicFile{folder_.file("other.xml").c_str()}.write("new")));
+    expect_header("old");
 }
 
-TEST(AtomicFile, GivesTheOldPermissionsOrTheUsualOnes) {
-    const TemporaryFolder folder;
-    const std::string name = folder.file("header.xml");
+TEST_F(AtomicFileTest, GivesTheOldPermissionsOrTheUsualOnes) {
     const mode_t before = umask(027);
-    EXPECT_TRUE(replace(name, "new"));
-    EXPECT_EQ(mode_of(name), 0640U);
+    EXPECT_TRUE(replace(folder_.file("new"), "new"));
+    EXPECT_EQ(mode_of(folder_.file("new")), 0640U);
     for (const mode_t mode : {0604, 0666, 0600, 0755}) {
-        chmod(name.c_str(), mode);
-        EXPECT_TRUE(replace(name, "newer"));
-        EXPECT_EQ(mode_of(name), mode);
+        chmod(name_.c_str(), mode);
+        EXPECT_TRUE(replace(name_, "new"));
+        EXPECT_EQ(mode_of(name_), mode);
     }
     umask(before);
 }
 
-TEST(AtomicFile, KeepsSymbolicLinks) {
-    const TemporaryFolder folder;
-    fs::create_directory(folder.file("data"));
-    fs::create_symlink("data/header.xml", folder.file("link"));
-    fs::create_symlink("link", folder.file("link_to_link"));
-    fs::create_symlink(folder.file("link_to_link"), folder.file("data/up"));
-    for (const char* name : {"link", "link_to_link", "data/up"}) {  // the first still leads nowhere
-        EXPECT_TRUE(replace(folder.file(name), name));
-        EXPECT_TRUE(fs::is_symlink(folder.file(name)));
-        EXPECT_EQ(read_text(folder.file("data/header.xml")), name);
+TEST_F(AtomicFileTest, KeepsSymbolicLinks) {
+    fs::create_directory(folder_.file("data"));
+    fs::create_symlink("data/other.xml", folder_.file("link"));  // leads nowhere yet
+    fs::create_symlink("link", folder_.file("link_to_link"));
+    fs::create_symlink(folder_.file("link_to_link"), folder_.file("data/up"));
+    for (const char* name : {"link", "link_to_link", "data/up"}) {
+        EXPECT_TRUE(replace(folder_.file(name), name));
+        EXPECT_TRUE(fs::is_symlink(folder_.file(name)));
+        EXPECT_EQ(read_text(folder_.file("data/other.xml")), name);
     }
-    EXPECT_EQ(entries(folder.path()), 3U);
-    EXPECT_EQ(entries(folder.path() / "data"), 2U);
+    expect_header("old", 3);
 }
 
-TEST(AtomicFile, WritesBesideARelativeName) {
-    const TemporaryFolder folder;
+TEST_F(AtomicFileTest, StaysInTheFolderWhereItBegan) {
     const fs::path before = fs::current_path();
-    fs::current_path(folder.path());
+    fs::current_path(folder_.path());
     AtomicFile file{"header.xml"};
-    fs::current_path(before);  // the folder stays the one of the beginning
+    fs::current_path(before);
     EXPECT_TRUE(file.write("new") && file.commit());
-    EXPECT_EQ(read_text(folder.file("header.xml")), "new");
+    expect_header("new");
 }
 
-TEST(AtomicFile, RefusesWhatIsNoFileToReplace) {
-    const TemporaryFolder folder;
-    fs::create_directory(folder.file("folder"));
-    fs::create_symlink("loop", folder.file("loop"));
-    mkfifo(folder.file("pipe").c_str(), 0600);
-    const std::size_t before = entries(folder.path());
-    const std::string names[] = {folder.file("folder"),
-                                 folder.file("folder/"),
-                                 folder.file("."),
-                                 folder.file("loop"),
-                                 folder.file("pipe"),
-                                 folder.file("missing/header.xml"),
-                                 folder.file("pipe/x"),
-                                 folder.file(std::string(256, 'x')),
-                                 folder.file("missing") + '/',
-                                 "/dev/null",
-                                 ""};
-    for (const std::string& name : names) {
+TEST_F(AtomicFileTest, RefusesWhatIsNoFileToReplace) {
+    fs::create_directory(folder_.file("folder"));
+    fs::create_symlink("loop", folder_.file("loop"));
+    mkfifo(folder_.file("pipe").c_str(), 0600);
+    for (const std::string& name :
+         {folder_.file("folder"), folder_.file("folder/"), folder_.file("."), folder_.file("loop"),
+          folder_.file("pipe"), folder_.file("missing/header.xml"), folder_.file("pipe/x"),
+          folder_.file("missing/"), folder_.file(std::string(256, 'x')), std::string{"/dev/null"},
+          std::string{}}) {
         SCOPED_TRACE(name);
         errno = 0;
         AtomicFile file{name.c_str()};
-        EXPECT_FALSE(file.good());
         EXPECT_NE(errno, 0);
-        EXPECT_FALSE(file.write("new"));
-        EXPECT_FALSE(file.commit());
+        EXPECT_FALSE(file.good() || file.write("new") || file.commit());
     }
     EXPECT_FALSE(AtomicFile{nullptr}.good());
-    EXPECT_EQ(entries(folder.path()), before);
-    EXPECT_TRUE(replace(folder.file(std::string(255, 'x')), "the longest name"));
-    errno = 0;
+    expect_header("old", 3);
+    EXPECT_TRUE(replace(folder_.file(std::string(255, 'x')), "the longest name"));
 }
 
-TEST(AtomicFile, RefusesAFileThatMayNotBeWritten) {
-    const TemporaryFolder folder;
-    const std::string name = folder.file("header.xml");
-    write_text(name, "protected");
-    chmod(name.c_str(), 0444);
-    chmod(folder.path().c_str(), 0777);
-    {
-        const OrdinaryUser user;
-        EXPECT_FALSE(AtomicFile{name.c_str()}.good());
-        EXPECT_EQ(errno, EACCES);
-        EXPECT_TRUE(replace(folder.file("other"), "new"));
-        chmod(folder.file("other").c_str(), 0666);
-    }
-    EXPECT_EQ(read_text(name), "protected");
-    EXPECT_EQ(entries(folder.path()), 2U);
-    errno = 0;
+TEST_F(AtomicFileTest, RefusesAFileThatMayNotBeWritten) {
+    chmod(name_.c_str(), 0444);
+    chmod(folder_.path().c_str(), 0777);
+    ASSERT_EQ(seteuid(getuid() == 0 ? 65534 : getuid()), 0);  // to the superuser every file is open
+    const bool refused = !AtomicFile{name_.c_str()}.good();
+    const int error = errno;
+    const bool made_another = replace(folder_.file("other"), "new");
+    ASSERT_EQ(seteuid(getuid()), 0);
+    EXPECT_TRUE(refused);
+    EXPECT_EQ(error, EACCES);
+    EXPECT_TRUE(made_another);
+    expect_header("old", 1);
 }
 
 // The disk fills up at every byte of the new content: all of it arrives or the old file stays.
-TEST(AtomicFile, KeepsTheOldFileWhicheverWriteFails) {
-    const TemporaryFolder folder;
-    const std::string name = folder.file("header.xml");
+TEST_F(AtomicFileTest, KeepsTheOldFileWhicheverWriteFails) {
     const std::string content = "first piece, second piece, third piece";
     for (rlim_t room = 0; room <= content.size(); ++room) {
         SCOPED_TRACE(room);
-        write_text(name, "old");
-        bool replaced = false;
+        bool written = true, replaced = false;
         int error = 0;
         {
             const FileSizeLimit limit{room};
-            AtomicFile file{name.c_str()};
-            bool written = true;
+            AtomicFile file{name_.c_str()};
             for (std::size_t at = 0; at < content.size(); at += 13) written = file.write(content.substr(at, 13));
             replaced = file.commit();
             error = errno;
-            EXPECT_EQ(written, replaced);
         }
-        EXPECT_EQ(replaced, room == content.size());
-        EXPECT_EQ(error, replaced ? 0 : EFBIG);
-        EXPECT_EQ(read_text(name), replaced ? content : "old");
-        EXPECT_EQ(entries(folder.path()), 1U);
+        const bool fits = room == content.size();
+        EXPECT_EQ(written, fits);
+        EXPECT_EQ(replaced, fits);
+        EXPECT_EQ(error, fits ? 0 : EFBIG);
+        expect_header(fits ? content : "old");
     }
-    errno = 0;
 }
 
-TEST(AtomicFile, FailsCleanlyWhenTheTargetTurnsIntoAFolder) {
-    const TemporaryFolder folder;
-    const std::string name = folder.file("header.xml");
+TEST_F(AtomicFileTest, FailsCleanlyWhenTheTargetTurnsIntoAFolder) {
+    const std::string name = folder_.file("other");
     AtomicFile file{name.c_str()};
     fs::create_directory(name);
     EXPECT_TRUE(file.write("new"));
     EXPECT_FALSE(file.commit());
     EXPECT_NE(errno, 0);
     EXPECT_TRUE(fs::is_directory(name));
-    EXPECT_EQ(entries(folder.path()), 1U);
-    errno = 0;
+    expect_header("old", 1);
 }
 
 }  // namespace

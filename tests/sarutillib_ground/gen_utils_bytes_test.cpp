@@ -99,16 +99,15 @@ TEST(Swap, ReversesEachElementAndNothingElse) {
         }
 }
 
-struct AnySize {
-    std::int64_t length;
-    int size;
-    std::size_t swapped;  // elements
-};
-constexpr AnySize kAnySizes[] = {{48, 16, 3}, {40, 16, 2}, {15, 16, 0}, {0, 16, 0}, {24, 6, 4}, {7, 2, 3},
-                                 {-16, 4, 0}, {48, 5, 0},  {48, -2, 0}, {48, 0, 0}, {48, 1, 0}, {48, 48, 1}};
-
 TEST(SwapAny, TakesWholeElementsOfEvenSize) {
-    for (const auto [length, size, swapped] : kAnySizes) {
+    struct Case {
+        std::int64_t length;
+        int size;
+        std::size_t swapped;  // elements
+    };
+    for (const auto [length, size, swapped] :
+         {Case{48, 16, 3}, Case{40, 16, 2}, Case{15, 16, 0}, Case{24, 6, 4}, Case{7, 2, 3}, Case{-16, 4, 0},
+          Case{48, 5, 0}, Case{48, -2, 0}, Case{48, 0, 0}, Case{48, 1, 0}, Case{48, 48, 1}}) {
         SCOPED_TRACE(testing::Message() << length << " bytes of elements of " << size);
         Bytes bytes = ramp(50);
         swp_any(bytes.data() + 1, length, size);
@@ -116,90 +115,59 @@ TEST(SwapAny, TakesWholeElementsOfEvenSize) {
     }
 }
 
-struct Block {
-    std::int64_t count;
-    int size, swap, result;
-    std::size_t swapped;
-};
-constexpr Block kBlocks[] = {{5, 2, 1, 0, 5},
-                             {5, 4, -1, 0, 5},
-                             {5, 8, 1, 0, 5},
-                             {5, 1, 1, 0, 0},
-                             {5, 4, 0, 0, 0},
-                             {5, 3, 0, 0, 0},
-                             {5, 3, 1, -1, 0},
-                             {5, 32, 1, -1, 0},
-                             {5, -4, 1, -1, 0},
-                             {5, 0, 1, -1, 0},
-                             {5, 16, 1, 0, 0},    // deliberate: five bytes hold
-                                                  // no element of sixteen
-                             {33, 16, 1, 0, 2}};  // deliberate: 33 bytes hold two
-
+// Deliberate: 33 elements of 16 bytes are taken for 33 bytes, which hold two, and 5 for 5, which hold none.
 TEST(GetEndian, SwapsByElementSize) {
-    for (const auto [count, size, swap, result, swapped] : kBlocks) {
+    struct Case {
+        int count, size, swap, result, swapped;
+    };
+    for (const auto [count, size, swap, result, swapped] :
+         {Case{5, 2, 1, 0, 5}, Case{5, 4, -1, 0, 5}, Case{5, 8, 1, 0, 5}, Case{5, 1, 1, 0, 0}, Case{5, 4, 0, 0, 0},
+          Case{5, 3, 0, 0, 0}, Case{5, 3, 1, -1, 0}, Case{5, 32, 1, -1, 0}, Case{5, -4, 1, -1, 0},
+          Case{5, 0, 1, -1, 0}, Case{5, 16, 1, 0, 0}, Case{33, 16, 1, 0, 2}}) {
         SCOPED_TRACE(testing::Message() << count << " elements of " << size << ", swap " << swap);
-        Bytes bytes = ramp(100);
+        Bytes bytes = ramp(600);
         EXPECT_EQ(get_endian(bytes.data(), count, size, swap), result);
-        EXPECT_EQ(bytes, reversed(ramp(100), 0, swapped, static_cast<std::size_t>(std::max(size, 0))));
+        EXPECT_EQ(bytes, reversed(ramp(600), 0, static_cast<std::size_t>(swapped),
+                                  static_cast<std::size_t>(std::max(size, 0))));
     }
 }
 
-enum Class { kFinite, kInfinite, kNotANumber };
-
-struct DoubleClass {
-    std::uint64_t bits;
-    Class expected;
+/** Bit patterns of one class each. */
+template <typename Bits>
+struct Patterns {
+    std::vector<Bits> finite, infinite, not_a_number;
 };
-constexpr DoubleClass kDoubles[] = {{0x0000000000000000, kFinite},
-                                    {0x0000000000000001, kFinite},
-                                    {0x7FEFFFFFFFFFFFFF, kFinite},
-                                    {0xFFEFFFFFFFFFFFFF, kFinite},
-                                    {0x400921FB54442D18, kFinite},
-                                    {0x7FF0000000000000, kInfinite},
-                                    {0xFFF0000000000000, kInfinite},
-                                    {0x7FF8000000000000, kNotANumber},
-                                    {0xFFF8000000000000, kNotANumber},
-                                    {0x7FF0000100000000, kNotANumber},
-                                    {0x7FFFFFFFFFFFFFFF, kNotANumber},
-                                    // Deliberate: what only the low word tells is not seen.
-                                    {0x7FF0000000000001, kInfinite},
-                                    {0xFFF00000FFFFFFFF, kInfinite}};
 
-TEST(NumberClass, OfADoubleLooksAtTheHighWord) {
-    for (const auto [bits, expected] : kDoubles) {
-        SCOPED_TRACE(testing::Message() << std::hex << bits);
-        const auto x = std::bit_cast<double>(bits);
-        EXPECT_EQ(myfinite(x), expected == kFinite);
-        EXPECT_EQ(myisinf(x), expected == kInfinite);
-        EXPECT_EQ(myisnan(x), expected == kNotANumber);
-    }
+template <typename Number, typename Bits, typename Test>
+void expect_class(const Patterns<Bits>& patterns, Test is_finite, Test is_infinite, Test is_not_a_number) {
+    const auto expect = [&](const std::vector<Bits>& class_bits, int finite, int infinite, int not_a_number) {
+        for (const Bits bits : class_bits) {
+            SCOPED_TRACE(testing::Message() << std::hex << bits);
+            EXPECT_EQ(is_finite(std::bit_cast<Number>(bits)), finite);
+            EXPECT_EQ(is_infinite(std::bit_cast<Number>(bits)), infinite);
+            EXPECT_EQ(is_not_a_number(std::bit_cast<Number>(bits)), not_a_number);
+        }
+    };
+    expect(patterns.finite, 1, 0, 0);
+    expect(patterns.infinite, 0, 1, 0);
+    expect(patterns.not_a_number, 0, 0, 1);
 }
 
-struct FloatClass {
-    std::uint32_t bits;
-    Class expected;
-};
-constexpr FloatClass kFloats[] = {{0x00000000, kFinite},
-                                  {0x80000001, kFinite},
-                                  {0x7F7FFFFE, kFinite},
-                                  {0x40490FDB, kFinite},
-                                  {0x7F800000, kInfinite},
-                                  {0xFF800000, kInfinite},
-                                  {0x7F800001, kNotANumber},
-                                  {0xFFC00000, kNotANumber},
-                                  {0x7FFFFFFF, kNotANumber},
-                                  // Deliberate: the largest float stands for infinity.
-                                  {0x7F7FFFFF, kInfinite},
-                                  {0xFF7FFFFF, kInfinite}};
+TEST(NumberClass, OfADoubleLooksAtTheHighWordOnly) {
+    const Patterns<std::uint64_t> patterns{
+        {0, 1, 0x400921FB54442D18, 0x7FEFFFFFFFFFFFFF, 0xFFEFFFFFFFFFFFFF},
+        {0x7FF0000000000000, 0xFFF0000000000000, 0x7FF0000000000001,
+         0xFFF00000FFFFFFFF},  // the last two deliberately
+        {0x7FF8000000000000, 0xFFF8000000000000, 0x7FF0000100000000, 0x7FFFFFFFFFFFFFFF}};
+    expect_class<double>(patterns, myfinite, myisinf, myisnan);
+}
 
 TEST(NumberClass, OfAFloatTakesTheLargestForInfinite) {
-    for (const auto [bits, expected] : kFloats) {
-        SCOPED_TRACE(testing::Message() << std::hex << bits);
-        const auto x = std::bit_cast<float>(bits);
-        EXPECT_EQ(myfinite4(x), expected == kFinite);
-        EXPECT_EQ(myisinf4(x), expected == kInfinite);
-        EXPECT_EQ(myisnan4(x), expected == kNotANumber);
-    }
+    const Patterns<std::uint32_t> patterns{
+        {0, 0x80000001, 0x40490FDB, 0x7F7FFFFE, 0xFF7FFFFE},
+        {0x7F800000, 0xFF800000, 0x7F7FFFFF, 0xFF7FFFFF},  // the last two deliberately
+        {0x7F800001, 0xFFC00000, 0x7FFFFFFF}};
+    expect_class<float>(patterns, myfinite4, myisinf4, myisnan4);
 }
 
 }  // namespace

@@ -28,11 +28,11 @@ constexpr auto kEndOfText = chr::sys_days{chr::year{10000} / 1 / 1};
 
 double sec85_of(chr::sys_days day) { return kDay * static_cast<double>((day - kEpoch).count()); }
 
-MjdRecord record_of(std::int32_t days, std::uint32_t seconds, std::uint32_t microseconds) {
+MjdRecord record_of(std::int32_t days, std::int32_t seconds, std::int32_t microseconds) {
     MjdRecord record;
     long2ch(days, record.days, 'm');
-    long2ch(static_cast<std::int32_t>(seconds), record.seconds, 'm');
-    long2ch(static_cast<std::int32_t>(microseconds), record.microseconds, 'm');
+    long2ch(seconds, record.seconds, 'm');
+    long2ch(microseconds, record.microseconds, 'm');
     return record;
 }
 
@@ -59,45 +59,35 @@ std::string date_text(double t) {
     return ended.data();
 }
 
-struct Instant {
-    std::string source, text;
-    std::int32_t days;
-    std::uint32_t seconds, microseconds;
-    double sec85;
-};
-
-/** The recorded instants; the columns are named in the file's second line. */
-std::vector<Instant> recorded_instants() {
+/** The cells of the recorded instants, line by line; the file's second line names the columns. */
+std::vector<std::vector<std::string>> recorded_instants() {
     std::ifstream file{QUO_TEST_DATA "/time/time_pairs.csv"};
-    std::vector<Instant> instants;
-    std::string line;
-    std::getline(file, line);
-    std::getline(file, line);
-    while (std::getline(file, line)) {
-        std::vector<std::string> columns;
+    std::vector<std::vector<std::string>> rows;
+    for (std::string line; std::getline(file, line);) {
         std::istringstream cells{line};
-        for (std::string cell; std::getline(cells, cell, ',');) columns.push_back(cell);
-        instants.push_back({columns.at(0), columns.at(4), std::stoi(columns.at(1)),
-                            static_cast<std::uint32_t>(std::stoul(columns.at(2))),
-                            static_cast<std::uint32_t>(std::stoul(columns.at(3))), std::stod(columns.at(5))});
+        rows.emplace_back();
+        for (std::string cell; std::getline(cells, cell, ',');) rows.back().push_back(cell);
     }
-    return instants;
+    rows.erase(rows.begin(), rows.begin() + 2);
+    return rows;
 }
 
 TEST(Time, AgreesWithRecordedInstants) {
-    const auto instants = recorded_instants();
-    ASSERT_FALSE(instants.empty());
-    for (const Instant& instant : instants) {
-        SCOPED_TRACE(instant.source);
-        const MjdRecord record = record_of(instant.days, instant.seconds, instant.microseconds);
-        EXPECT_NEAR(mjd2sec85(record), instant.sec85, 2e-7);
-        EXPECT_NEAR(ascii2sec85(instant.text.c_str()), instant.sec85, 2e-7);
+    for (const auto& cells : recorded_instants()) {
+        SCOPED_TRACE(cells.at(0));
+        const auto number = [&](std::size_t column) {
+            return static_cast<std::int32_t>(std::stoi(cells.at(column)));
+        };
+        const MjdRecord record = record_of(number(1), number(2), number(3));
+        const std::string& text = cells.at(4);
+        EXPECT_NEAR(mjd2sec85(record), std::stod(cells.at(5)), 2e-7);
+        EXPECT_NEAR(ascii2sec85(text.c_str()), std::stod(cells.at(5)), 2e-7);
 
-        std::array<char, 27> text;
-        mjd2ascii(record, text.data());
+        std::array<char, 27> found;
+        mjd2ascii(record, found.data());
         // A double holds these times to 1e-7 s, and cutting may take the last microsecond.
-        EXPECT_EQ(std::string(text.data(), 20), instant.text.substr(0, 20));
-        EXPECT_NEAR(std::stod(std::string(text.data() + 18, 9)), std::stod(instant.text.substr(18)), 1.1e-6);
+        EXPECT_EQ(std::string(found.data(), 20), text.substr(0, 20));
+        EXPECT_NEAR(std::stod(std::string(found.data() + 18, 9)), std::stod(text.substr(18)), 1.1e-6);
     }
 }
 
@@ -139,29 +129,15 @@ TEST(Time, FollowsTheCalendar) {
 }
 
 TEST(Time, CountsBackToTheFirstYears) {
-    for (int year = 1; year < 1985; ++year) {
-        const std::string text = "29-DEC-" +
-                                 std::string(year < 10     ? "000"
-                                             : year < 100  ? "00"
-                                             : year < 1000 ? "0"
-                                                           : "") +
-                                 std::to_string(year);
-        EXPECT_EQ(ascii2sec85(text.c_str()), sec85_of(chr::year{year} / 12 / 29)) << text;
-    }
+    for (int year = 1; year < 1985; ++year)
+        EXPECT_EQ(ascii2sec85(("29-DEC-" + std::to_string(year)).c_str()), sec85_of(chr::year{year} / 12 / 29))
+            << year;
 }
 
 TEST(Time, RefusesWhatTheTextCannotHold) {
-    struct Refused {
-        double t;
-        const char* message;
-    };
-    const Refused cases[] = {{-1e-9, "Date should be later than 1-JAN-1985\n"},
-                             {-kInfinity, "Date should be later than 1-JAN-1985\n"},
-                             {sec85_of(kEndOfText), "Date should be earlier than 1-JAN-10000\n"},
-                             {1e300, "Date should be earlier than 1-JAN-10000\n"},
-                             {kInfinity, "Date should be earlier than 1-JAN-10000\n"},
-                             {std::nan(""), "Date should be earlier than 1-JAN-10000\n"}};
-    for (const auto& [t, message] : cases) {
+    for (const double t : {-1e-9, -kInfinity, sec85_of(kEndOfText), 1e300, kInfinity, std::nan("")}) {
+        const std::string message =
+            t < 0.0 ? "Date should be later than 1-JAN-1985\n" : "Date should be earlier than 1-JAN-10000\n";
         std::array<char, 28> text;
         text.fill('#');
         CapturedStderr captured;
@@ -207,75 +183,70 @@ TEST(MjdRecord, NeverHasNegativeSeconds) {
     }
 }
 
-struct DateText {
-    const char* text;
-    int code;
-    DateFields fields;
-};
-const std::string kForty(40, '.'), kThirtyNine(39, '.');
-const DateText kDates[] = {
-    {"03-JUL-2004 20:53:38.75", 0, {2004, 7, 185, 20, 53, 38, 0.75}},
-    {"Start = 3-jul-2004 7:05", 0, {2004, 7, 185, 7, 5, 0, 0.0}},
-    {"1-JAN-1985", 0, {1985, 1, 1, 0, 0, 0, 0.0}},
-    {"29-Feb-2000 24:60:60.5", 0, {2000, 2, 60, 24, 60, 60, 0.5}},
-    {"0-MAR-2001", 0, {2001, 3, 59, 0, 0, 0, 0.0}},
-    {"31-DEC-1988 00:00:1e1", 0, {1988, 12, 366, 0, 0, 10, 0.0}},
-    {"", -1, {}},
-    {"no digits", -1, {}},
-    {"29-FEB-1900", 0x1, {}},
-    {"31-APR-2001", 0x1, {}},
-    {"12-APR-2001 25:00:00", 0x10, {}},
-    {"12-APR-2001 -1:00:00", 0x10, {}},
-    {"12-APR--99", 0x100, {}},
-    {"31-XYZ-2001 10:61:00", 0x1000, {}},
-    {"12-APRIL-2001", 0, {0, 4, 103, 0, 0, 0, 0.0}},  // the third letter is not followed by a hyphen: no year
-    {"12", 0x1000, {}},
-    {"12-APR-2001 10:20:61", 0x10000, {}},
-    {"12-APR-2001 10:20:-0.5", 0x10000, {}},
-    {"12-APR-2001 10:20:nan", 0x10000, {}},
-    {"12-APR-2001 10:20:inf", 0x10000, {}},
-    {"12-APR-2001 10:20:1e300", 0x10000, {}},
-    {"32-APR--99 25:61:61", 0x11111, {}},
-};
-
-void expect_date(const std::string& text, int code, const DateFields& expected) {
-    SCOPED_TRACE(text);
-    DateFields found{-1, -1, -1, -1, -1, -1, -1.0};
-    EXPECT_EQ(date2str(text.c_str(), &found), code);
-    const DateFields wanted = code == 0 ? expected : DateFields{-1, -1, -1, -1, -1, -1, -1.0};
-    EXPECT_EQ(found.year, wanted.year);
-    EXPECT_EQ(found.month, wanted.month);
-    EXPECT_EQ(found.day_of_year, wanted.day_of_year);
-    EXPECT_EQ(found.hour, wanted.hour);
-    EXPECT_EQ(found.minute, wanted.minute);
-    EXPECT_EQ(found.second, wanted.second);
-    EXPECT_EQ(found.fraction, wanted.fraction);
+std::string shown(const DateFields& f) {
+    std::ostringstream text;
+    text << f.year << '-' << f.month << " day " << f.day_of_year << ' ' << f.hour << ':' << f.minute << ':'
+         << f.second << " + " << f.fraction;
+    return text.str();
 }
 
-TEST(DateText, IsTakenApartOrRefusedWithItsFlags) {
-    for (const DateText& row : kDates) expect_date(row.text, row.code, row.fields);
+/** What date2str makes of a text: its fields, or its code when it refuses and keeps its hands off the output. */
+std::string parsed(const std::string& text) {
+    const DateFields before{-1, -1, -1, -1, -1, -1, -1.0};
+    DateFields found = before;
+    const int code = date2str(text.c_str(), &found);
+    EXPECT_TRUE(code == 0 || shown(found) == shown(before)) << text;
+    return code == 0 ? shown(found) : std::to_string(code);
 }
 
+TEST(DateText, IsTakenApart) {
+    struct Case {
+        const char* text;
+        DateFields fields;
+    };
+    const Case cases[] = {
+        {"03-JUL-2004 20:53:38.75", {2004, 7, 185, 20, 53, 38, 0.75}},
+        {"Start = 3-jul-2004 7:05", {2004, 7, 185, 7, 5, 0, 0.0}},
+        {"1-JAN-1985", {1985, 1, 1, 0, 0, 0, 0.0}},
+        {"29-Feb-2000 24:60:60.5", {2000, 2, 60, 24, 60, 60, 0.5}},
+        {"0-MAR-2001", {2001, 3, 59, 0, 0, 0, 0.0}},
+        {"31-DEC-1988 00:00:1e1", {1988, 12, 366, 0, 0, 10, 0.0}},
+        {"12-APRIL-2001", {0, 4, 103, 0, 0, 0, 0.0}},  // no hyphen after the third letter: the year is not read
+    };
+    for (const auto& [text, fields] : cases) EXPECT_EQ(parsed(text), shown(fields)) << text;
+}
+
+TEST(DateText, IsRefusedWithItsFlags) {
+    struct Case {
+        const char* text;
+        int flags;
+    };
+    for (const auto& [text, flags] :
+         {Case{"", -1}, Case{"no digits", -1}, Case{"29-FEB-1900", 0x1}, Case{"31-APR-2001", 0x1},
+          Case{"12-APR-2001 25:00:00", 0x10}, Case{"12-APR-2001 -1:00:00", 0x10}, Case{"12-APR--99", 0x100},
+          Case{"31-XYZ-2001 10:61:00", 0x1000}, Case{"12", 0x1000}, Case{"12-APR-2001 10:20:61", 0x10000},
+          Case{"12-APR-2001 10:20:-0.5", 0x10000}, Case{"12-APR-2001 10:20:nan", 0x10000},
+          Case{"12-APR-2001 10:20:inf", 0x10000}, Case{"12-APR-2001 10:20:1e300", 0x10000},
+          Case{"32-APR--99 25:61:61", 0x11111}})
+        EXPECT_EQ(parsed(text), std::to_string(flags)) << text;
+}
+
+// Deliberate: from the 41st character on everything is taken as it stands.
 TEST(DateText, IsLookedForInFortyCharacters) {
-    const DateFields first_of_may{1991, 5, 121, 0, 0, 0, 0.0};
-    expect_date(kThirtyNine + "1-MAY-1991", 0, first_of_may);
-    expect_date(kForty + "1-MAY-1991", 0, first_of_may);
-    expect_date(kThirtyNine, -1, {});
-    // Deliberate: from the 41st character on everything is taken as it stands.
-    expect_date(kForty, 0x1000, {});
-    expect_date(kForty + ".1-MAY-1991", 0x1000, {});
-    expect_date(kForty + "-1-MAY-1991", 0x1, {});
+    const std::string forty(40, '.'), thirty_nine(39, '.'), may = parsed("1-MAY-1991");
+    EXPECT_EQ(parsed(thirty_nine + "1-MAY-1991"), may);
+    EXPECT_EQ(parsed(forty + "1-MAY-1991"), may);
+    EXPECT_EQ(parsed(forty + ".1-MAY-1991"), std::to_string(0x1000));
+    EXPECT_EQ(parsed(forty + "-1-MAY-1991"), std::to_string(0x1));
+    EXPECT_EQ(parsed(forty), std::to_string(0x1000));
+    EXPECT_EQ(parsed(thirty_nine), std::to_string(-1));
 }
 
 TEST(DateText, ThatIsWrongCountsAsZeroAndIsNamed) {
     CapturedStderr captured;
     EXPECT_EQ(ascii2sec85("31-XYZ-2001"), 0.0);
-    EXPECT_EQ(ascii2sec85(""), 0.0);
     EXPECT_EQ(ascii2sec85(nullptr), 0.0);
-    EXPECT_EQ(captured.text(),
-              "Error: incorrect date format, code 4096\n"
-              "Error: incorrect date format, code -1\n"
-              "Error: incorrect date format, code -1\n");
+    EXPECT_EQ(captured.text(), "Error: incorrect date format, code 4096\nError: incorrect date format, code -1\n");
 }
 
 TEST(DateDifference, IsSignedAndPassesTheFirstErrorOn) {
@@ -287,39 +258,27 @@ TEST(DateDifference, IsSignedAndPassesTheFirstErrorOn) {
     EXPECT_EQ(seconds, -18.5);
 }
 
-struct UtcText {
-    const char* text;
-    double number;
-};
-constexpr UtcText kUtcTexts[] = {
-    {"03-JUL-2004 20:53:38.232", 20040703205338.232},
-    {"3-DEC-2004 7:05:09.5", 20041203070509.005},
-    {"31-JAN-1985", 19850131000000.0},
-    {"99-JAN-1985 99:99:99.000", 19850199999999.0},
-    {"03-jul-2004", 20041303000000.0},
-    {"", 13e8},
-};
-
 TEST(UtcNumber, IsReadWithoutAnyCheck) {
-    for (const auto [text, number] : kUtcTexts) EXPECT_NEAR(utc_ch2num(text), number, 0.004) << text;
+    struct Case {
+        const char* text;
+        double number;
+    };
+    for (const auto& [text, number] :
+         {Case{"03-JUL-2004 20:53:38.232", 20040703205338.232}, Case{"3-DEC-2004 7:05:09.5", 20041203070509.005},
+          Case{"31-JAN-1985", 19850131e6}, Case{"99-JAN-1985 99:99:99.000", 19850199999999.0},
+          Case{"03-jul-2004", 20041303e6}, Case{"", 13e8}})
+        EXPECT_NEAR(utc_ch2num(text), number, 0.004) << text;
 }
 
-struct Pair {
-    const char *a, *b;
-    int difference;
-};
-constexpr Pair kPairs[] = {{"DescendING", "dESCENDing", 0},
-                           {"abc", "ABD", -1},
-                           {"abcd", "ABC", 'd'},
-                           {"", "A", -'a'},
-                           {"@", "`", '@' - '`'},
-                           {"[", "{", '[' - '{'},
-                           {"\xC4", "\xE4", 0xC4 - 0xE4},
-                           {"\xC4", "a", 0xC4 - 'a'},
-                           {nullptr, "", 0}};
-
 TEST(CompareWithoutCase, FoldsAsciiLettersOnly) {
-    for (const auto& [a, b, difference] : kPairs) {
+    struct Case {
+        const char *a, *b;
+        int difference;
+    };
+    for (const auto& [a, b, difference] :
+         {Case{"DescendING", "dESCENDing", 0}, Case{"abc", "ABD", -1}, Case{"abcd", "ABC", 'd'},
+          Case{"", "A", -'a'}, Case{"@", "`", '@' - '`'}, Case{"[", "{", '[' - '{'},
+          Case{"\xC4", "\xE4", 0xC4 - 0xE4}, Case{"\xC4", "a", 0xC4 - 'a'}, Case{nullptr, "", 0}}) {
         EXPECT_EQ(mystrcasecmp(a, b), difference) << b;
         EXPECT_EQ(mystrcasecmp(b, a), -difference) << b;
     }

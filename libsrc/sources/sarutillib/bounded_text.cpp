@@ -17,9 +17,7 @@ std::size_t sequence_length(unsigned char lead) noexcept {
     return lead >= 0xC0 ? 2 : 1;
 }
 
-bool continues_sequence(unsigned char byte) noexcept {
-    return (byte & 0xC0) == 0x80;
-}
+bool continues_sequence(unsigned char byte) noexcept { return (byte & 0xC0) == 0x80; }
 
 /** Length of a cut text without the sequence that the cut left incomplete. Bytes that are no UTF-8 stay. */
 std::size_t whole_sequences(const char* text, std::size_t length) noexcept {

@@ -16,9 +16,9 @@
 namespace quo {
 namespace {
 
-constexpr int kMostLinks = 40;       // as many as the kernel follows
-constexpr int kTemporaryTries = 32;  // names are random: a second try is already rare
-constexpr mode_t kPermissions = 07777;
+constexpr int kMostLinks = 40;         // as many as the kernel follows
+constexpr int kTemporaryTries = 32;    // names are random: a second try is already rare
+constexpr mode_t kPermissions = 0777;  // set-user and set-group bits go, as they do whenever a file is written
 
 bool refuse(int error) noexcept {
     errno = error;
@@ -52,8 +52,7 @@ std::optional<std::string> link_text(const std::string& path) {
     return text;
 }
 
-/** Where a write to `path` ends up: links in the last place are followed, also to a file that is yet to be made.
- */
+/** Where a write to `path` ends up: links in the last place are followed, also to a file yet to be made. */
 std::optional<std::string> follow_links(std::string path) {
     for (int links = 0; links <= kMostLinks; ++links) {
         auto next = link_text(path);
@@ -64,8 +63,7 @@ std::optional<std::string> follow_links(std::string path) {
     return std::nullopt;
 }
 
-/** A folder that may be written but not listed can still be worked in; only its flush is then left to the system.
- */
+/** A folder that may be written but not listed can be worked in; only its flush is then left to the system. */
 Descriptor open_folder(const std::string& folder) noexcept {
     constexpr int kFlags = O_DIRECTORY | O_CLOEXEC;
     Descriptor opened{::open(folder.c_str(), O_RDONLY | kFlags)};
@@ -147,9 +145,7 @@ AtomicFile::AtomicFile(const char* path) noexcept {
     }
 }
 
-AtomicFile::~AtomicFile() {
-    discard();
-}
+AtomicFile::~AtomicFile() { discard(); }
 
 bool AtomicFile::open(std::string path) {
     const auto followed = follow_links(std::move(path));

@@ -12,15 +12,9 @@ namespace {
 
 static_assert(std::endian::native == std::endian::little, "endi answers 'l'");
 
-std::uint16_t swapped(std::uint16_t bits) noexcept {
-    return __builtin_bswap16(bits);
-}
-std::uint32_t swapped(std::uint32_t bits) noexcept {
-    return __builtin_bswap32(bits);
-}
-std::uint64_t swapped(std::uint64_t bits) noexcept {
-    return __builtin_bswap64(bits);
-}
+std::uint16_t swapped(std::uint16_t bits) noexcept { return __builtin_bswap16(bits); }
+std::uint32_t swapped(std::uint32_t bits) noexcept { return __builtin_bswap32(bits); }
+std::uint64_t swapped(std::uint64_t bits) noexcept { return __builtin_bswap64(bits); }
 
 /** Whether bytes in this order must be exchanged on the host. */
 bool needs_swap(char order) noexcept {
@@ -51,13 +45,30 @@ void write_bits(Bits bits, void* bytes, char order) noexcept {
 }
 
 template <typename Bits>
-void swap_array(void* buffer, std::int64_t count) noexcept {
+[[gnu::always_inline]] inline void swap_each(void* buffer, std::int64_t count) noexcept {
     auto* const bytes = static_cast<unsigned char*>(buffer);
     for (std::int64_t i = 0; i < count; ++i) {
         unsigned char* const element = bytes + i * static_cast<std::int64_t>(sizeof(Bits));
         const Bits bits = swapped(load<Bits>(element));
         std::memcpy(element, &bits, sizeof bits);
     }
+}
+
+// The byte shuffles that make these loops fast came after the processors' common base: each loop is compiled for
+// several of them, and the form to use is chosen when the library is loaded.
+#if defined(__x86_64__) && defined(__gnu_linux__)
+#define QUO_FORM_PER_PROCESSOR __attribute__((target_clones("avx2", "ssse3", "default")))
+#else
+#define QUO_FORM_PER_PROCESSOR
+#endif
+QUO_FORM_PER_PROCESSOR void swap_2(void* buffer, std::int64_t count) noexcept {
+    swap_each<std::uint16_t>(buffer, count);
+}
+QUO_FORM_PER_PROCESSOR void swap_4(void* buffer, std::int64_t count) noexcept {
+    swap_each<std::uint32_t>(buffer, count);
+}
+QUO_FORM_PER_PROCESSOR void swap_8(void* buffer, std::int64_t count) noexcept {
+    swap_each<std::uint64_t>(buffer, count);
 }
 
 // High words of a double and words of a float.
@@ -67,42 +78,26 @@ constexpr std::uint32_t kFloatMagnitude = 0x7FFFFFFF, kFloatInfinity = 0x7F80000
 std::uint32_t high_word(double x) noexcept {
     return static_cast<std::uint32_t>(std::bit_cast<std::uint64_t>(x) >> 32);
 }
-bool has_full_exponent(double x) noexcept {
-    return (high_word(x) & kDoubleExponent) == kDoubleExponent;
-}
-bool has_high_fraction(double x) noexcept {
-    return (high_word(x) & kDoubleHighFraction) != 0;
-}
-std::uint32_t magnitude(float x) noexcept {
-    return std::bit_cast<std::uint32_t>(x) & kFloatMagnitude;
-}
+bool has_full_exponent(double x) noexcept { return (high_word(x) & kDoubleExponent) == kDoubleExponent; }
+bool has_high_fraction(double x) noexcept { return (high_word(x) & kDoubleHighFraction) != 0; }
+std::uint32_t magnitude(float x) noexcept { return std::bit_cast<std::uint32_t>(x) & kFloatMagnitude; }
 
 }  // namespace
 
 extern "C" {
 
-char endi() noexcept {
-    return 'l';
-}
-std::uint16_t bsw2b(std::uint16_t value) noexcept {
-    return swapped(value);
-}
+char endi() noexcept { return 'l'; }
+std::uint16_t bsw2b(std::uint16_t value) noexcept { return swapped(value); }
 
-std::uint16_t ch2uint2(const void* bytes, char order) noexcept {
-    return read_bits<std::uint16_t>(bytes, order);
-}
-std::uint32_t ch2uint4(const void* bytes, char order) noexcept {
-    return read_bits<std::uint32_t>(bytes, order);
-}
+std::uint16_t ch2uint2(const void* bytes, char order) noexcept { return read_bits<std::uint16_t>(bytes, order); }
+std::uint32_t ch2uint4(const void* bytes, char order) noexcept { return read_bits<std::uint32_t>(bytes, order); }
 std::int16_t ch2int2(const void* bytes, char order) noexcept {
     return static_cast<std::int16_t>(ch2uint2(bytes, order));
 }
 std::int32_t ch2int4(const void* bytes, char order) noexcept {
     return static_cast<std::int32_t>(ch2uint4(bytes, order));
 }
-std::int32_t ch2long4(const void* bytes, char order) noexcept {
-    return ch2int4(bytes, order);
-}
+std::int32_t ch2long4(const void* bytes, char order) noexcept { return ch2int4(bytes, order); }
 float ch2float4(const void* bytes, char order) noexcept {
     return std::bit_cast<float>(read_bits<std::uint32_t>(bytes, order));
 }
@@ -120,15 +115,9 @@ void short2ch(std::int16_t value, void* bytes, char order) noexcept {
     write_bits(static_cast<std::uint16_t>(value), bytes, order);
 }
 
-void swp2(void* buffer, std::int64_t count) noexcept {
-    swap_array<std::uint16_t>(buffer, count);
-}
-void swp4(void* buffer, std::int64_t count) noexcept {
-    swap_array<std::uint32_t>(buffer, count);
-}
-void swp8(void* buffer, std::int64_t count) noexcept {
-    swap_array<std::uint64_t>(buffer, count);
-}
+void swp2(void* buffer, std::int64_t count) noexcept { swap_2(buffer, count); }
+void swp4(void* buffer, std::int64_t count) noexcept { swap_4(buffer, count); }
+void swp8(void* buffer, std::int64_t count) noexcept { swap_8(buffer, count); }
 
 void swp_any(void* buffer, std::int64_t length_in_bytes, int element_size) noexcept {
     if (element_size <= 0 || element_size % 2 != 0) return;
@@ -159,24 +148,12 @@ int get_endian(void* buffer, std::int64_t count, int element_size, int swap) noe
     }
 }
 
-int myisinf(double x) noexcept {
-    return has_full_exponent(x) && !has_high_fraction(x);
-}
-int myisnan(double x) noexcept {
-    return has_full_exponent(x) && has_high_fraction(x);
-}
-int myfinite(double x) noexcept {
-    return !has_full_exponent(x);
-}
+int myisinf(double x) noexcept { return has_full_exponent(x) && !has_high_fraction(x); }
+int myisnan(double x) noexcept { return has_full_exponent(x) && has_high_fraction(x); }
+int myfinite(double x) noexcept { return !has_full_exponent(x); }
 
-int myisinf4(float x) noexcept {
-    return magnitude(x) == kFloatInfinity || magnitude(x) == kLargestFloat;
-}
-int myisnan4(float x) noexcept {
-    return magnitude(x) > kFloatInfinity;
-}
-int myfinite4(float x) noexcept {
-    return magnitude(x) < kLargestFloat;
-}
+int myisinf4(float x) noexcept { return magnitude(x) == kFloatInfinity || magnitude(x) == kLargestFloat; }
+int myisnan4(float x) noexcept { return magnitude(x) > kFloatInfinity; }
+int myfinite4(float x) noexcept { return magnitude(x) < kLargestFloat; }
 
 }  // extern "C"

@@ -20,9 +20,7 @@ std::optional<std::int64_t> seek_base(std::FILE* stream, int whence) noexcept {
     return here < 0 ? std::nullopt : std::optional<std::int64_t>{here};
 }
 
-bool is_separator(char c) noexcept {
-    return c == '/' || c == '\\';
-}
+bool is_separator(char c) noexcept { return c == '/' || c == '\\'; }
 
 }  // namespace
 

@@ -25,12 +25,8 @@ constexpr std::array<const char*, 12> kMonths{"JAN", "FEB", "MAR", "APR", "MAY",
                                               "JUL", "AUG", "SEP", "OCT", "NOV", "DEC"};
 constexpr int kMonthCount = static_cast<int>(kMonths.size());
 
-constexpr bool is_leap(int year) noexcept {
-    return (year % 4 == 0 && year % 100 != 0) || year % 400 == 0;
-}
-constexpr int days_of_year(int year) noexcept {
-    return is_leap(year) ? 366 : 365;
-}
+constexpr bool is_leap(int year) noexcept { return (year % 4 == 0 && year % 100 != 0) || year % 400 == 0; }
+constexpr int days_of_year(int year) noexcept { return is_leap(year) ? 366 : 365; }
 
 /** Days of a month, counted from 0. */
 constexpr int days_of_month(int month, int year) noexcept {
@@ -176,12 +172,8 @@ int sec852myascii(double t, char* text_out) noexcept {
     return 0;
 }
 
-void sec852ascii(double t, char* text_out) noexcept {
-    write_27(t, text_out);
-}
-void mjd2ascii(MjdRecord record, char* text_out) noexcept {
-    write_27(mjd2sec85(record), text_out);
-}
+void sec852ascii(double t, char* text_out) noexcept { write_27(t, text_out); }
+void mjd2ascii(MjdRecord record, char* text_out) noexcept { write_27(mjd2sec85(record), text_out); }
 
 int date2str(const char* text, DateFields* fields_out) noexcept {
     const char* const date = text ? find_date(text) : nullptr;

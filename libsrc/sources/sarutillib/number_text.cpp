@@ -62,22 +62,12 @@ NumberText general_text(DecimalDigits number, int precision, bool negative) noex
     return text;
 }
 
-bool is_space(char c) noexcept {
-    return c == ' ' || (c >= '\t' && c <= '\r');
-}
-bool is_digit(char c) noexcept {
-    return c >= '0' && c <= '9';
-}
+bool is_space(char c) noexcept { return c == ' ' || (c >= '\t' && c <= '\r'); }
+bool is_digit(char c) noexcept { return c >= '0' && c <= '9'; }
 /** Letters in lower case; no other character becomes a letter. */
-char lower(char c) noexcept {
-    return static_cast<char>(c | 0x20);
-}
-bool is_letter(char c) noexcept {
-    return lower(c) >= 'a' && lower(c) <= 'z';
-}
-bool is_hex_digit(char c) noexcept {
-    return is_digit(c) || (lower(c) >= 'a' && lower(c) <= 'f');
-}
+char lower(char c) noexcept { return static_cast<char>(c | 0x20); }
+bool is_letter(char c) noexcept { return lower(c) >= 'a' && lower(c) <= 'z'; }
+bool is_hex_digit(char c) noexcept { return is_digit(c) || (lower(c) >= 'a' && lower(c) <= 'f'); }
 
 /** What stands before the digits of a number: where they begin, and whether a minus comes first. */
 struct Lead {
@@ -118,8 +108,7 @@ struct Decimal {
     std::size_t length;
 };
 
-/** Reads the plain cases, up to 19 digits and with no letter but the exponent's mark; for all others length is 0.
- */
+/** Reads the plain cases: up to 19 digits and no letter but the exponent's mark. For all others length is 0. */
 Decimal scan_decimal(const char* begin, const char* end) noexcept {
     constexpr std::ptrdiff_t kMostDigitsRead = std::numeric_limits<std::uint64_t>::digits10;
     std::uint64_t digits = 0;
@@ -203,12 +192,8 @@ NumberText format_general(double value, int precision) noexcept {
     return text_of(value, std::chars_format::general, digits);
 }
 
-NumberText format_exact(double value) noexcept {
-    return text_of(value);
-}
-NumberText format_int(std::int64_t value) noexcept {
-    return text_of(value);
-}
+NumberText format_exact(double value) noexcept { return text_of(value); }
+NumberText format_int(std::int64_t value) noexcept { return text_of(value); }
 
 Scanned<double> scan_double(std::string_view text) noexcept {
     const char* const end = text.data() + text.size();

@@ -70,16 +70,17 @@ constexpr Scaled<Wide> previous_power(Scaled<Wide> power, Scaled<std::uint64_t> 
 constexpr PowerTable make_powers() noexcept {
     constexpr Scaled<Wide> kOne{Wide{1} << 127, -127};
     constexpr auto kStep = small_power(kPowerStep);
+    constexpr std::size_t kPlaceOfOne = kPowersBelow;
     PowerTable table{};
-    const auto put = [&](int i, Scaled<Wide> power) {
-        table[static_cast<std::size_t>(kPowersBelow + i)] = {static_cast<std::uint64_t>(power.mantissa >> 64),
-                                                             power.exponent + 64};
+    const auto put = [&](std::size_t place, Scaled<Wide> power) {
+        table[place] = {static_cast<std::uint64_t>(power.mantissa >> 64), power.exponent + 64};
     };
-    put(0, kOne);
+    put(kPlaceOfOne, kOne);
     auto power = kOne;
-    for (int i = 1; i <= kPowersAbove; ++i) put(i, power = next_power(power, kStep));
+    for (std::size_t place = kPlaceOfOne + 1; place < table.size(); ++place)
+        put(place, power = next_power(power, kStep));
     power = kOne;
-    for (int i = 1; i <= kPowersBelow; ++i) put(-i, power = previous_power(power, kStep));
+    for (std::size_t place = kPlaceOfOne; place-- > 0;) put(place, power = previous_power(power, kStep));
     return table;
 }
 

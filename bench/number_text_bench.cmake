@@ -1,0 +1,1 @@
+quo_bench(number_text SOURCES number_text_bench.cpp COMPONENTS gen_utils)
