@@ -29,9 +29,9 @@
  * refused.
  *
  * Headers are read without network access, without entity substitution and without loading of DTDs; a document
- * that declares anything in a DTD of its own, nests deeper than 256 elements or holds a text above 10 million
- * characters counts as unreadable. A file above 256 MiB, or one that memory is too short for, gives 7 and is never
- * replaced by a fresh document. File names hold at most 511 bytes; a longer one is refused, never cut.
+ * that declares anything in a DTD of its own or nests deeper than 256 elements counts as unreadable. A text above
+ * ten million bytes, a file above 256 MiB and a real lack of memory give 7, and the file is never replaced by a
+ * fresh document. File names hold at most 511 bytes; a longer one is refused, never cut.
  *
  * Operations return 0, 1 (refused: missing field, bad argument, file that cannot be read or saved) or 7 (out of
  * memory) unless said otherwise. One object serves one thread at a time. */
@@ -88,9 +88,8 @@ public:
     int writeDouble(int channel, const char* field, const double* values, int count) noexcept;
     int writeString(int channel, const char* field, const char* const* values, int count) noexcept;
 
-    /** How floats and doubles are written by every document that has no choice of its own: false (the default)
-     * with
-     * "%.15g", true with the shortest text that reads back to the same double. Process-wide. */
+    /** How floats and doubles are written by every document that has no choice of its own: "%.15g" while false,
+     * as at first; with true the shortest text that reads back to the same double. Process-wide. */
     static void setExactNumbers(bool exact) noexcept;
     /** The same choice for this document alone. */
     void useExactNumbers(bool exact) noexcept;
@@ -121,7 +120,7 @@ protected:
     /** Removes every element of the field. */
     int clearField(int channel, const char* field) noexcept;
     /** Builds the scan format of a list: type 0 double, 1 float, 2 int, 3 string; cut to whole items within 4096
-     * characters. Lists are scanned with formats of their own (see format()). */
+     * characters. Lists are read with formats of their own, whose length does not grow with the list. */
     int setFormat(int count, int type);
 
     const std::string& format() const noexcept { return format_; }
@@ -147,8 +146,7 @@ private:
     std::string file_name_, description_, format_;
     std::int32_t number_of_channels_ = 0;
     bool debug_ = false;
-    bool irreplaceable_ =
-        false;  // the file is there but does not fit into memory: no fresh document may replace it
+    bool irreplaceable_ = false;  // the file does not fit into memory: no fresh document may replace it
     Exactness exactness_ = Exactness::kDefault;
 };
 
@@ -244,11 +242,14 @@ public:
     const parElement* element(int index) const noexcept;
 
 protected:
-    /** Registers every element, always the same number in the same order, and ends with setAllocationFlag(true).
-     */
+    /** Registers every element, always as many in the same order, and ends with setAllocationFlag(true). */
     virtual void refreshParameters();
 
+    /** Makes the table with `count` slots and fills it by refreshParameters(); called by the derived constructor.
+     * A table that another base class made before is released. 0, 1 or 7. */
     int createElementsVector(int count);
+    /** Each fills the next slot, the first one again after the last. 0; 1, with the pending errors cleared, when
+     * the table has no slots. `values` is not owned; a count of 0 stands for an array that is not allocated. */
     int addElementDouble(const char* name, double* values, int count, double minimum, double maximum,
                          bool mandatory);
     int addElementFloat(const char* name, float* values, int count, float minimum, float maximum, bool mandatory);
@@ -259,7 +260,10 @@ protected:
     int addElementString(const char* name, char** texts, int count, bool mandatory);
     /** A single text with room for `room` bytes. */
     int addElementText(const char* name, char* text, std::size_t room, bool mandatory);
+    /** Whether the object's arrays are allocated and its table is complete: without it nothing is written, and
+     * nothing read beyond the single values. */
     int setAllocationFlag(bool allocated) noexcept;
+    /** Forgets the table, and releases it while setParamListAlloc() says so. */
     int destroyElementsVector() noexcept;
 
     /** Whether the file that is being read is large enough for `count` values: asked before memory is taken for a

@@ -80,13 +80,9 @@ static void copy_bytes(const Values& from, const Values& to) {
     if (bytes > 0) std::memcpy(to.pointer, from.pointer, bytes);
 }
 
-void copy_values(const FieldValue& from, const FieldValue& to) {
-    copy_bytes(from, to);
-}
+void copy_values(const FieldValue& from, const FieldValue& to) { copy_bytes(from, to); }
 
-void copy_values(const parElement& from, const parElement& to) {
-    copy_bytes(from, to);
-}
+void copy_values(const parElement& from, const parElement& to) { copy_bytes(from, to); }
 
 const parElement* registered_array(const GeneralSAR_BaseXML& object, const char* name) {
     for (int i = 0; i < object.elementCount(); ++i) {

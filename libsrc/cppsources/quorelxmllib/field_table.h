@@ -101,17 +101,13 @@ struct Bounds {
     double minimum, maximum;
 };
 /** The values that make sense; not enforced on reading. */
-constexpr Bounds bounds(double minimum, double maximum) {
-    return {minimum, maximum};
-}
+constexpr Bounds bounds(double minimum, double maximum) { return {minimum, maximum}; }
 
 struct Element {
     const char* name;
 };
 /** The element name, where it is not the member's own. */
-constexpr Element element(const char* name) {
-    return {name};
-}
+constexpr Element element(const char* name) { return {name}; }
 
 /** The length of an array of any length; see QUO_LENGTH. */
 template <typename Owner>

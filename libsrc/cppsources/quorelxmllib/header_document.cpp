@@ -2,12 +2,14 @@
 
 #include <fcntl.h>
 #include <libxml/parser.h>
+#include <libxml/xmlerror.h>
 #include <libxml/xmlsave.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
+#include <cstring>
 
 #include "quo_base/api.h"
 #include "sarutillib/file_io.h"
@@ -23,9 +25,28 @@ constexpr const char* kNumber = "Number";
 // A tree takes up to thirty times the memory of its text; the largest headers have a few megabytes.
 constexpr std::int64_t kMostBytes = 256LL << 20;
 
-const xmlChar* xml(const char* text) {
-    return reinterpret_cast<const xmlChar*>(text);
-}
+const xmlChar* xml(const char* text) { return reinterpret_cast<const xmlChar*>(text); }
+
+/** While it lives, libxml2 prints nothing on this thread, and a lack of memory is noted, which later errors hide.
+ */
+class XmlErrors {
+public:
+    XmlErrors() noexcept : handler_{xmlStructuredError}, context_{xmlStructuredErrorContext} {
+        xmlSetStructuredErrorFunc(this, [](void* self, xmlError* error) {
+            if (error->code == XML_ERR_NO_MEMORY) static_cast<XmlErrors*>(self)->out_of_memory_ = true;
+        });
+    }
+    ~XmlErrors() { xmlSetStructuredErrorFunc(context_, handler_); }
+    XmlErrors(const XmlErrors&) = delete;
+    XmlErrors& operator=(const XmlErrors&) = delete;
+
+    [[nodiscard]] bool out_of_memory() const noexcept { return out_of_memory_; }
+
+private:
+    xmlStructuredErrorFunc handler_;
+    void* context_;
+    bool out_of_memory_ = false;
+};
 
 // --- reading ----------------------------------------------------------------------------------------------------
 
@@ -45,22 +66,22 @@ int read_source(void* context, char* buffer, int length) {
     return source.too_long ? -1 : static_cast<int>(got);
 }
 
+void stop(void* parser) { xmlStopParser(static_cast<xmlParserCtxt*>(parser)); }
+
 /** A parser that stops at the first declaration in a DTD: entities declared there could grow without bound. */
 std::unique_ptr<xmlParserCtxt, decltype(&xmlFreeParserCtxt)> make_parser() {
     xmlParserCtxt* parser = xmlNewParserCtxt();
     if (parser) {
-        const auto stop = [](void* context) { xmlStopParser(static_cast<xmlParserCtxt*>(context)); };
-        static constexpr auto kStop = +stop;
         xmlSAXHandler& events = *parser->sax;
-        events.entityDecl = [](void* context, auto...) { kStop(context); };
-        events.notationDecl = [](void* context, auto...) { kStop(context); };
+        events.entityDecl = [](void* context, auto...) { stop(context); };
+        events.notationDecl = [](void* context, auto...) { stop(context); };
         events.attributeDecl = [](void* context, const xmlChar*, const xmlChar*, int, int, const xmlChar*,
                                   xmlEnumeration* values) {
             xmlFreeEnumeration(values);
-            kStop(context);
+            stop(context);
         };
-        events.elementDecl = [](void* context, auto...) { kStop(context); };
-        events.unparsedEntityDecl = [](void* context, auto...) { kStop(context); };
+        events.elementDecl = [](void* context, auto...) { stop(context); };
+        events.unparsedEntityDecl = [](void* context, auto...) { stop(context); };
     }
     return {parser, &xmlFreeParserCtxt};
 }
@@ -78,15 +99,16 @@ int open_source(const char* file, Source& source) {
 int HeaderDocument::load(const char* file, std::shared_ptr<HeaderDocument>& document) {
     Source source;
     if (const int status = open_source(file, source)) return status;
+    const XmlErrors errors;
     const auto parser = make_parser();
     if (!parser) return QUO_NO_MEMORY;
-    constexpr int kOptions =
-        XML_PARSE_NOBLANKS | XML_PARSE_COMPACT | XML_PARSE_NONET | XML_PARSE_NOERROR | XML_PARSE_NOWARNING;
+    constexpr int kOptions = XML_PARSE_NOBLANKS | XML_PARSE_COMPACT | XML_PARSE_NONET;
     std::unique_ptr<xmlDoc, FreeXml> tree{
         xmlCtxtReadIO(parser.get(), read_source, nullptr, &source, nullptr, nullptr, kOptions)};
-    // A parser that ran out of memory, or stopped at a text that is too long, hands over the part that it has and
-    // calls it well-formed.
-    if (source.too_long || parser->errNo == XML_ERR_NO_MEMORY) return QUO_NO_MEMORY;
+    // A text that is too long counts as a lack of memory too; what fails without an error never got to parse.
+    const bool unexplained = !tree && parser->errNo == XML_ERR_OK;
+    if (source.too_long || errors.out_of_memory() || unexplained) return QUO_NO_MEMORY;
+    // A parser that was stopped hands over the part that it has and calls it well-formed.
     if (!tree || parser->disableSAX) return QUO_REFUSED;
     document = std::make_shared<HeaderDocument>(tree.get(), source.bytes);
     (void)tree.release();
@@ -148,6 +170,7 @@ int write_sink(void* context, const char* bytes, int length) {
 bool HeaderDocument::save(const char* file) const {
     Sink sink{file};
     if (!sink.good()) return false;
+    const XmlErrors errors;
     // Without an encoder the text, which is UTF-8 in memory, is written as it stands: the bytes are those of
     // xmlSaveFormatFileEnc.
     xmlOutputBuffer* output = xmlOutputBufferCreateIO(write_sink, nullptr, &sink, nullptr);
@@ -171,7 +194,8 @@ NodeText::NodeText(xmlNode* node) noexcept {
 
 bool is_named(const xmlNode* node, std::string_view name) noexcept {
     if (node->type != XML_ELEMENT_NODE || node->ns) return false;
-    return reinterpret_cast<const char*>(node->name) == name;
+    const char* own = reinterpret_cast<const char*>(node->name);
+    return std::strncmp(own, name.data(), name.size()) == 0 && own[name.size()] == '\0';
 }
 
 namespace {
@@ -242,12 +266,17 @@ xmlNode* HeaderDocument::append(xmlNode* parent, std::string_view name) {
         remove(parent->children);
     // No content, rather than an empty one: an empty text node would be written as <a></a> and stop the
     // indentation.
-    return xmlNewChild(parent, nullptr, xml(std::string{name}.c_str()), nullptr);
+    xmlNode* node = xmlNewChild(parent, nullptr, xml(std::string{name}.c_str()), nullptr);
+    if (!node || node->name) return node;
+    remove(node);  // made while memory ran out
+    return nullptr;
 }
 
 xmlNode* HeaderDocument::append_channel(int channel) {
     xmlNode* node = append(root(), kChannel);
-    return node && set_attribute(node, kNumber, format_int(channel).data) ? node : nullptr;
+    if (!node || set_attribute(node, kNumber, format_int(channel).data)) return node;
+    remove(node);
+    return nullptr;
 }
 
 xmlNode* HeaderDocument::ensure(int channel, std::string_view path) {
@@ -279,7 +308,10 @@ bool HeaderDocument::insert_instruction(const char* name, const char* content) {
     xmlNode* before = xmlDocGetRootElement(tree_.get());
     if (!before || before->prev) return true;
     xmlNode* instruction = xmlNewDocPI(tree_.get(), xml(name), xml(content));
-    if (!instruction) return false;
+    if (!instruction || !instruction->name || !instruction->content) {
+        xmlFreeNode(instruction);
+        return false;
+    }
     xmlAddPrevSibling(before, instruction);
     return true;
 }
@@ -290,8 +322,10 @@ void remove(xmlNode* node) noexcept {
 }
 
 bool set_attribute(xmlNode* node, const char* name, const char* value) noexcept {
-    const xmlAttr* attribute = xmlSetNsProp(node, nullptr, xml(name), xml(value));
-    return attribute && attribute->children;
+    xmlAttr* set = xmlSetNsProp(node, nullptr, xml(name), xml(value));
+    const bool whole = set && set->name && set->children && set->children->content;
+    if (set && !whole) xmlRemoveProp(set);
+    return whole;
 }
 
 }  // namespace quo

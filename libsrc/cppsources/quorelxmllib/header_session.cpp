@@ -33,9 +33,7 @@ bool same_file(const std::string& a, const char* b) {
 HeaderSession::HeaderSession(const char* file)
     : outer_{std::exchange(innermost, this)}, file_{text_or_empty(file)} {}
 
-HeaderSession::~HeaderSession() {
-    innermost = outer_;
-}
+HeaderSession::~HeaderSession() { innermost = outer_; }
 
 HeaderSession* HeaderSession::find(const char* file) noexcept {
     if (!file) return nullptr;

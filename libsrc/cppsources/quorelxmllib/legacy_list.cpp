@@ -104,14 +104,8 @@ std::string list_format(int count, int type) {
     return format += last;
 }
 
-int scan_list(const char* text, double* values, int count) noexcept {
-    return scan(text, values, count);
-}
-int scan_list(const char* text, float* values, int count) noexcept {
-    return scan(text, values, count);
-}
-int scan_list(const char* text, std::int32_t* values, int count) noexcept {
-    return scan(text, values, count);
-}
+int scan_list(const char* text, double* values, int count) noexcept { return scan(text, values, count); }
+int scan_list(const char* text, float* values, int count) noexcept { return scan(text, values, count); }
+int scan_list(const char* text, std::int32_t* values, int count) noexcept { return scan(text, values, count); }
 
 }  // namespace quo

@@ -40,9 +40,7 @@ int guarded(CallFrame& frame, Operation operation) noexcept {
     }
 }
 
-int out_of_memory(CallFrame& frame) noexcept {
-    return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
-}
+int out_of_memory(CallFrame& frame) noexcept { return frame.fail(QUO_NO_MEMORY, "Memory allocation failure"); }
 
 void print_missing(const char* what) noexcept {
     std::fprintf(stderr, "File not recognized: %s does not exist\n", what);
@@ -55,15 +53,9 @@ struct Reading {
     const char* field;
 };
 
-void convert(const char* text, std::int32_t& value) noexcept {
-    value = quo::scan_int32(text).value;
-}
-void convert(const char* text, double& value) noexcept {
-    value = quo::scan_double(text).value;
-}
-void convert(const char* text, float& value) noexcept {
-    value = static_cast<float>(quo::scan_double(text).value);
-}
+void convert(const char* text, std::int32_t& value) noexcept { value = quo::scan_int32(text).value; }
+void convert(const char* text, double& value) noexcept { value = quo::scan_double(text).value; }
+void convert(const char* text, float& value) noexcept { value = static_cast<float>(quo::scan_double(text).value); }
 
 /** Reads up to `count` values from the `val` children of an element; returns how many it had. */
 template <typename T>
@@ -95,22 +87,16 @@ bool read_numbers(const HeaderDocument& document, int channel, std::string_view 
 
 quorelxml::quorelxml() noexcept = default;
 
-quorelxml::quorelxml(const char* file_name) noexcept {
-    (void)initXmlFile(file_name);
-}
+quorelxml::quorelxml(const char* file_name) noexcept { (void)initXmlFile(file_name); }
 
-quorelxml::~quorelxml() {
-    (void)clean();
-}
+quorelxml::~quorelxml() { (void)clean(); }
 
 int quorelxml::setDebug(bool debug) noexcept {
     debug_ = debug;
     return QUO_OK;
 }
 
-void quorelxml::setExactNumbers(bool exact) noexcept {
-    exact_numbers = exact;
-}
+void quorelxml::setExactNumbers(bool exact) noexcept { exact_numbers = exact; }
 
 void quorelxml::useExactNumbers(bool exact) noexcept {
     exactness_ = exact ? Exactness::kExact : Exactness::kRounded;
@@ -141,6 +127,7 @@ int quorelxml::parse() noexcept {
     CallFrame frame{"quorelxml::parse", kSource};
     return guarded(frame, [&] {
         document_.reset();
+        irreplaceable_ = true;  // also when the next line throws
         const int status = HeaderDocument::load(file_name_.c_str(), document_);
         CallFrame::drop_errno();  // a missing file is no error here
         irreplaceable_ = status == QUO_NO_MEMORY;
@@ -262,9 +249,7 @@ void quorelxml::printMissing(int channel, const char* field) const {
     print_missing(expression.c_str());
 }
 
-void* quorelxml::getNode(int channel, const char* field) const {
-    return getNode(channel, field, 0);
-}
+void* quorelxml::getNode(int channel, const char* field) const { return getNode(channel, field, 0); }
 
 void* quorelxml::getNode(int channel, const char* field, int index) const {
     xmlNode* found = nullptr;
@@ -289,9 +274,7 @@ int quorelxml::countNodes(int channel, const char* field) const {
     return count;
 }
 
-bool quorelxml::channelExists(int channel) const {
-    return document_ && getNode(channel, "");
-}
+bool quorelxml::channelExists(int channel) const { return document_ && getNode(channel, ""); }
 
 bool quorelxml::fieldExists(int channel, const char* field) const {
     return document_ && document_->first(channel, quo::text_or_empty(field));
@@ -388,6 +371,7 @@ struct quorelxml::Operations {
     template <typename TextOf>
     static int write(quorelxml& self, CallFrame& frame, int channel, const char* path, int count, TextOf text_of) {
         if (count < 1) return frame.success();
+        if (!quo::is_field_path(path)) return frame.fail(QUO_REFUSED, "Bad field name");
         const auto wanted = static_cast<std::size_t>(count);
         std::vector<xmlNode*> nodes;
         if (self.document_) nodes = self.document_->all(channel, path, wanted);

@@ -64,13 +64,9 @@ GeneralSAR_BaseXML::~GeneralSAR_BaseXML() {
     (void)document_.clean();
 }
 
-int GeneralSAR_BaseXML::createBuffers() {
-    return QUO_OK;
-}
+int GeneralSAR_BaseXML::createBuffers() { return QUO_OK; }
 
-int GeneralSAR_BaseXML::destroyBuffers() {
-    return QUO_OK;
-}
+int GeneralSAR_BaseXML::destroyBuffers() { return QUO_OK; }
 
 void GeneralSAR_BaseXML::refreshParameters() {}
 
@@ -79,26 +75,20 @@ int GeneralSAR_BaseXML::setParamListAlloc(bool owned) noexcept {
     return QUO_OK;
 }
 
-bool GeneralSAR_BaseXML::isBufferAllocated() const noexcept {
-    return allocated_;
-}
+bool GeneralSAR_BaseXML::isBufferAllocated() const noexcept { return allocated_; }
 
 int GeneralSAR_BaseXML::setAllocationFlag(bool allocated) noexcept {
     allocated_ = allocated;
     return QUO_OK;
 }
 
-int GeneralSAR_BaseXML::elementCount() const noexcept {
-    return element_count_;
-}
+int GeneralSAR_BaseXML::elementCount() const noexcept { return element_count_; }
 
 const parElement* GeneralSAR_BaseXML::element(int index) const noexcept {
     return index >= 0 && index < element_count_ ? elements_ + index : nullptr;
 }
 
-void GeneralSAR_BaseXML::setExactNumbers(bool exact) noexcept {
-    document_.useExactNumbers(exact);
-}
+void GeneralSAR_BaseXML::setExactNumbers(bool exact) noexcept { document_.useExactNumbers(exact); }
 
 int GeneralSAR_BaseXML::createElementsVector(int count) {
     CallFrame frame{"GeneralSAR_BaseXML::createElementsVector", kSource};
@@ -212,13 +202,9 @@ int GeneralSAR_BaseXML::cleanAuxiliaryFile() noexcept {
     return status ? frame.callee(status) : frame.success();
 }
 
-bool GeneralSAR_BaseXML::checkAuxiliaryFile() const noexcept {
-    return true;
-}
+bool GeneralSAR_BaseXML::checkAuxiliaryFile() const noexcept { return true; }
 
-bool GeneralSAR_BaseXML::checkAuxiliaryFile(const char*, int, const char*) const noexcept {
-    return true;
-}
+bool GeneralSAR_BaseXML::checkAuxiliaryFile(const char*, int, const char*) const noexcept { return true; }
 
 bool GeneralSAR_BaseXML::getConfigurationFile(const char* file, int channel, const char* section,
                                               char* text) noexcept {
@@ -382,27 +368,17 @@ bool GeneralSAR_BaseXML::readAuxiliaryFile(const char* file, int channel, const 
 
 GeneralSAR_Base::~GeneralSAR_Base() = default;
 
-int GeneralSAR_Base::createBuffers() {
-    return QUO_OK;
-}
+int GeneralSAR_Base::createBuffers() { return QUO_OK; }
 
-int GeneralSAR_Base::destroyBuffers() {
-    return QUO_OK;
-}
+int GeneralSAR_Base::destroyBuffers() { return QUO_OK; }
 
 void GeneralSAR_Base::refreshParameters() {}
 
-int GeneralSAR_Base::writehdr() {
-    return QUO_OK;
-}
+int GeneralSAR_Base::writehdr() { return QUO_OK; }
 
-int GeneralSAR_Base::writehdr(const char*) {
-    return QUO_OK;
-}
+int GeneralSAR_Base::writehdr(const char*) { return QUO_OK; }
 
-int GeneralSAR_Base::readhdr(const char*) {
-    return QUO_OK;
-}
+int GeneralSAR_Base::readhdr(const char*) { return QUO_OK; }
 
 // --- the way in for tables --------------------------------------------------------------------------------------
 
@@ -420,9 +396,7 @@ void RegistryAccess::set_allocated(GeneralSAR_BaseXML& object, bool allocated) {
     (void)object.setAllocationFlag(allocated);
 }
 
-void RegistryAccess::refresh(GeneralSAR_BaseXML& object) {
-    object.refreshParameters();
-}
+void RegistryAccess::refresh(GeneralSAR_BaseXML& object) { object.refreshParameters(); }
 
 bool RegistryAccess::can_hold(const GeneralSAR_BaseXML& object, std::int64_t count) {
     return object.sourceCanHold(count);

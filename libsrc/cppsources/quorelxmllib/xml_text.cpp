@@ -49,24 +49,36 @@ void append_latin1(std::string& text, char byte) {
     text += static_cast<char>(0x80U | (code & 0x3FU));
 }
 
+bool is_utf8(std::string_view text) {
+    while (!text.empty()) {
+        const std::size_t length = decode(text).length;
+        if (length == 0) return false;
+        text.remove_prefix(length);
+    }
+    return true;
+}
+
 bool is_element_name(std::string_view name) {
-    return xmlValidateNCName(reinterpret_cast<const xmlChar*>(std::string{name}.c_str()), 0) == 0;
+    // The validation takes a Latin-1 letter for a letter.
+    return is_utf8(name) && xmlValidateNCName(reinterpret_cast<const xmlChar*>(std::string{name}.c_str()), 0) == 0;
 }
 
 }  // namespace
 
 std::optional<std::string> xml_text(std::string_view text) {
+    if (text.size() > kLongestText) return std::nullopt;
     std::string result;
-    result.reserve(text.size());
-    while (!text.empty()) {
-        const Character next = decode(text);
+    std::size_t copied = 0;
+    for (std::size_t place = 0; place < text.size();) {
+        const Character next = decode(text.substr(place));
         if (next.length > 0 && !is_xml_character(next.code)) return std::nullopt;
-        if (next.length > 0)
-            result += text.substr(0, next.length);
-        else
-            append_latin1(result, text.front());
-        text.remove_prefix(std::max<std::size_t>(next.length, 1));
+        place += std::max<std::size_t>(next.length, 1);
+        if (next.length > 0) continue;
+        result.append(text, copied, place - 1 - copied);
+        append_latin1(result, text[place - 1]);
+        copied = place;
     }
+    result.append(text, copied);
     if (result.size() > kLongestText) return std::nullopt;
     return result;
 }

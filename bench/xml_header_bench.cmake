@@ -1,0 +1,1 @@
+quo_bench(xml_header SOURCES xml_header_bench.cpp COMPONENTS quorelxml)

@@ -1,0 +1,150 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <sys/resource.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <csignal>
+#include <string>
+
+#include "header_files.h"
+#include "quorelxmllib/header_session.h"
+#include "shelf.h"
+
+namespace {
+
+using test::read_text;
+using test::Shelf;
+using test::write_text;
+using testing::ElementsAre;
+
+/** Files cannot grow beyond so many bytes: what a full disk looks like to a writer. */
+class FileSizeLimit {
+public:
+    explicit FileSizeLimit(std::size_t bytes) {
+        handler_ = std::signal(SIGXFSZ, SIG_IGN);
+        getrlimit(RLIMIT_FSIZE, &before_);
+        const rlimit limit{bytes, before_.rlim_max};
+        setrlimit(RLIMIT_FSIZE, &limit);
+    }
+    ~FileSizeLimit() {
+        setrlimit(RLIMIT_FSIZE, &before_);
+        std::signal(SIGXFSZ, handler_);
+        errno = 0;
+    }
+    FileSizeLimit(const FileSizeLimit&) = delete;
+    FileSizeLimit& operator=(const FileSizeLimit&) = delete;
+
+private:
+    rlimit before_{};
+    void (*handler_)(int);
+};
+
+/** The rights of an ordinary user, also where the tests run as the administrator. */
+class OrdinaryUser {
+public:
+    OrdinaryUser() : before_{geteuid()} {
+        if (before_ == 0 && seteuid(65534) != 0) throw std::runtime_error("cannot give up rights");
+    }
+    ~OrdinaryUser() {
+        if (seteuid(before_) != 0) std::abort();
+        errno = 0;
+    }
+    OrdinaryUser(const OrdinaryUser&) = delete;
+    OrdinaryUser& operator=(const OrdinaryUser&) = delete;
+
+private:
+    uid_t before_;
+};
+
+using Save = int (*)(Shelf& object, const char* file);
+int by_object(Shelf& object, const char* file) { return object.writeAuxiliaryFile(file, 1, "Shelf"); }
+int by_session(Shelf& object, const char* file) {
+    quo::HeaderSession session{file};
+    EXPECT_EQ(object.writeAuxiliaryFile(file, 1, "Shelf"), 0);
+    return session.commit();
+}
+int by_document(Shelf& object, const char* file) {
+    quorelxml document{file};
+    document.writeDouble(1, "Shelf/width", &object.width, 1);
+    return document.write();
+}
+int by_description(Shelf& object, const char* file) { return quorelxml{}.setDescription(file, object.label); }
+
+struct SaveCase {
+    const char* name;
+    Save save;
+};
+constexpr SaveCase kSaves[] = {
+    {"Object", by_object}, {"Session", by_session}, {"Document", by_document}, {"Description", by_description}};
+
+class FailedSave : public testing::TestWithParam<SaveCase> {
+protected:
+    FailedSave() {
+        write_text(file_, old_);
+        object_.fill(20);
+    }
+    /** The save must fail, say so in the report, and leave the folder as it was. */
+    void expect_failure(const std::string& file) {
+        const auto before = test::entries(folder_);
+        test::Report report;
+        const test::CapturedStderr quiet;
+        EXPECT_EQ(GetParam().save(object_, file.c_str()), 1);
+        EXPECT_THAT(report.messages("ERROR"), testing::Contains("File writing failed!"));
+        EXPECT_EQ(test::entries(folder_), before);
+        EXPECT_TRUE(read_text(file_) == old_);
+    }
+    test::TemporaryFolder folder_;
+    const std::string file_ = folder_.file("header.xml"), old_ = Shelf::text();
+    Shelf object_;
+};
+
+TEST_P(FailedSave, LeavesTheOldHeaderWhereverTheDiskFillsUp) {
+    const std::string whole = folder_.file("whole.xml");
+    write_text(whole, old_);
+    ASSERT_EQ(GetParam().save(object_, whole.c_str()), 0);
+    const std::size_t size = read_text(whole).size();
+    for (std::size_t room = 0; room < size; room += room < 16 || size - room < 16 ? 1 : 97) {
+        SCOPED_TRACE(room);
+        const test::CapturedStderr quiet;
+        const FileSizeLimit limit{room};
+        EXPECT_EQ(GetParam().save(object_, file_.c_str()), 1);
+        EXPECT_TRUE(read_text(file_) == old_);
+    }
+    EXPECT_THAT(test::entries(folder_), ElementsAre("header.xml", "whole.xml"));
+    const FileSizeLimit enough{size};
+    EXPECT_EQ(GetParam().save(object_, file_.c_str()), 0);
+    EXPECT_EQ(read_text(file_), read_text(whole));
+}
+
+TEST_P(FailedSave, RefusesFoldersDevicesAndPlacesThatAreNotThere) {
+    expect_failure(folder_.path().string());
+    expect_failure("/dev/full");
+    expect_failure(folder_.file("none/header.xml"));
+    expect_failure(file_ + "/header.xml");
+    expect_failure(folder_.file(std::string(300, 'n')));
+}
+
+TEST_P(FailedSave, RespectsFilesAndFoldersThatMayNotBeWritten) {
+    ASSERT_EQ(chmod(folder_.path().c_str(), 0777), 0);
+    ASSERT_EQ(chmod(file_.c_str(), 0444), 0);
+    {
+        const OrdinaryUser user;
+        test::CapturedStderr quiet;
+        EXPECT_EQ(GetParam().save(object_, file_.c_str()), 1);
+    }
+    ASSERT_EQ(chmod(file_.c_str(), 0666), 0);
+    ASSERT_EQ(chmod(folder_.path().c_str(), 0555), 0);
+    {
+        const OrdinaryUser user;
+        test::CapturedStderr quiet;
+        EXPECT_EQ(GetParam().save(object_, file_.c_str()), 1);
+    }
+    EXPECT_EQ(read_text(file_), old_);
+    EXPECT_THAT(test::entries(folder_), ElementsAre("header.xml"));
+    ASSERT_EQ(chmod(folder_.path().c_str(), 0755), 0);
+}
+INSTANTIATE_TEST_SUITE_P(Saves, FailedSave, testing::ValuesIn(kSaves),
+                         [](const auto& row) { return row.param.name; });
+
+}  // namespace

@@ -1,0 +1,170 @@
+#include "quorelxmllib/header_session.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <functional>
+#include <string>
+
+#include "header_files.h"
+#include "shelf.h"
+
+namespace {
+
+using quo::HeaderSession;
+using test::read_text;
+using test::Shelf;
+using test::write_text;
+
+class HeaderSessionTest : public testing::Test {
+protected:
+    HeaderSessionTest() { object_.fill(3); }
+    int write(const std::string& file, const char* section, int channel = 1) {
+        return object_.writeAuxiliaryFile(file.c_str(), channel, section);
+    }
+    bool read(const std::string& file, const char* section) {
+        return Shelf{}.readAuxiliaryFile(file.c_str(), 1, section);
+    }
+    test::TemporaryFolder folder_;
+    const std::string file_ = folder_.file("header.xml");
+    Shelf object_;
+};
+
+/** Writes a product; the same bytes must reach the disk in one save and object by object. */
+void write_product(const std::string& file, Shelf& object) {
+    const std::string shelf = "Shelf", room = "Library/Room-";
+    for (int round = 0; round < 2; ++round) {
+        EXPECT_EQ(object.writeAuxiliaryFile(file.c_str(), 1, "Library"), 0);
+        for (int i = 0; i < 5; ++i)
+            EXPECT_EQ(object.writeAuxiliaryFile(file.c_str(), 1, (room + std::to_string(i)).c_str()), 0);
+        for (const int channel : {1, 2})
+            EXPECT_EQ(object.writeAuxiliaryFile(file.c_str(), channel, shelf.c_str()), 0);
+        object.fill(7 * round);
+    }
+}
+
+TEST_F(HeaderSessionTest, WritesTheBytesOfObjectByObject) {
+    for (const char* before : {"", "<Other/>", "text"}) {
+        const std::string alone = folder_.file("alone.xml");
+        const std::string text = *before == 't' ? Shelf::text() : before;
+        write_text(alone, text);
+        write_text(file_, text);
+        object_.fill(3);
+        write_product(alone, object_);
+        object_.fill(3);
+        {
+            HeaderSession session{file_.c_str()};
+            write_product(file_, object_);
+            EXPECT_EQ(read_text(file_), text) << "nothing is saved before the end";
+            EXPECT_EQ(session.commit(), 0);
+        }
+        EXPECT_EQ(read_text(file_), read_text(alone));
+    }
+}
+
+TEST_F(HeaderSessionTest, ParsesOnce) {
+    write_text(file_, Shelf::text());
+    const HeaderSession session{file_.c_str()};
+    EXPECT_TRUE(read(file_, "Shelf"));
+    std::filesystem::remove(file_);
+    EXPECT_TRUE(read(file_, "Shelf"));
+    EXPECT_FALSE(read(file_, "None"));
+    char name[32];
+    EXPECT_TRUE(object_.getConfigurationFile(file_.c_str(), 1, "Shelf", name, sizeof name));
+}
+
+TEST_F(HeaderSessionTest, ServesOnlyItsOwnFileButUnderEveryName) {
+    write_text(file_, Shelf::text());
+    const std::string link = folder_.file("link.xml"), other = folder_.file("other.xml");
+    std::filesystem::create_symlink("header.xml", link);
+    HeaderSession session{file_.c_str()};
+    EXPECT_EQ(write(other, "Elsewhere"), 0);
+    EXPECT_EQ(write(folder_.path().string() + "/./header.xml", "A"), 0);
+    EXPECT_EQ(write(link, "B"), 0);
+    EXPECT_EQ(read_text(file_), Shelf::text());
+    EXPECT_NE(read_text(other).find("<Elsewhere>"), std::string::npos);
+    EXPECT_EQ(session.commit(), 0);
+    EXPECT_TRUE(read(file_, "A") && read(file_, "B") && read(file_, "Shelf"));
+}
+
+TEST_F(HeaderSessionTest, ShowsWhatWasWrittenBeforeItIsSaved) {
+    HeaderSession session{file_.c_str()};
+    EXPECT_FALSE(read(file_, "Shelf"));
+    object_.fill(500);  // more values than the file, which is not there, could hold
+    EXPECT_EQ(write(file_, "Shelf"), 0);
+    EXPECT_TRUE(read(file_, "Shelf"));
+    EXPECT_EQ(session.commit(), 0);
+    EXPECT_EQ(write(file_, "More"), 0);
+    EXPECT_EQ(session.commit(), 0);
+    EXPECT_NE(read_text(file_).find("<More>"), std::string::npos);
+}
+
+TEST_F(HeaderSessionTest, TouchesNothingWithoutAWriteOrACommit) {
+    {
+        HeaderSession session{file_.c_str()};
+        EXPECT_FALSE(read(file_, "Shelf"));
+        EXPECT_EQ(session.commit(), 0);
+        EXPECT_EQ(write(file_, "Shelf"), 0);
+    }
+    EXPECT_FALSE(std::filesystem::exists(file_));
+    EXPECT_EQ(write(file_, "Shelf"), 0) << "on its own again";
+    EXPECT_TRUE(std::filesystem::exists(file_));
+}
+
+TEST_F(HeaderSessionTest, KeepsTheSectionOfAnObjectThatCannotBeWritten) {
+    write_text(file_, Shelf::text());
+    const test::CapturedStderr quiet;
+    HeaderSession session{file_.c_str()};
+    std::snprintf(object_.label, sizeof object_.label, "\x07");
+    EXPECT_EQ(write(file_, "Shelf"), 1);
+    object_.destroyBuffers();
+    EXPECT_EQ(write(file_, "Shelf"), 1);
+    object_.fill(1);
+    EXPECT_EQ(write(file_, "Other"), 0);
+    EXPECT_EQ(session.commit(), 0);
+    EXPECT_TRUE(read(file_, "Shelf") && read(file_, "Other"));
+}
+
+TEST_F(HeaderSessionTest, SavesNoDocumentThatAFailedWriteLeftIncomplete) {
+    write_text(file_, Shelf::text());
+    const test::CapturedStderr quiet;
+    HeaderSession session{file_.c_str()};
+    EXPECT_EQ(write(file_, "Fine"), 0);
+    EXPECT_EQ(write(file_, "not a name"), 1);
+    EXPECT_EQ(session.commit(), 1);
+    EXPECT_EQ(read_text(file_), Shelf::text());
+}
+
+TEST_F(HeaderSessionTest, NestsForOtherFiles) {
+    const std::string inner_file = folder_.file("inner.xml");
+    HeaderSession outer{file_.c_str()};
+    {
+        HeaderSession inner{inner_file.c_str()};
+        EXPECT_EQ(HeaderSession::find(file_.c_str()), &outer);
+        EXPECT_EQ(HeaderSession::find(inner_file.c_str()), &inner);
+        EXPECT_EQ(write(inner_file, "Inner"), 0);
+        EXPECT_EQ(write(file_, "Outer"), 0);
+        EXPECT_EQ(inner.commit(), 0);
+    }
+    EXPECT_EQ(HeaderSession::find(inner_file.c_str()), nullptr);
+    EXPECT_EQ(HeaderSession::find(nullptr), nullptr);
+    EXPECT_TRUE(std::filesystem::exists(inner_file));
+    EXPECT_FALSE(std::filesystem::exists(file_));
+    EXPECT_EQ(outer.commit(), 0);
+    EXPECT_TRUE(read(file_, "Outer"));
+}
+
+TEST_F(HeaderSessionTest, NeverReplacesAFileThatDoesNotFitIntoMemory) {
+    std::string text = Shelf::text();
+    text.insert(text.find("Novels"), std::string(11'000'000, 'x'));
+    write_text(file_, text);
+    const test::CapturedStderr quiet;
+    HeaderSession session{file_.c_str()};
+    EXPECT_FALSE(read(file_, "Shelf"));
+    EXPECT_EQ(write(file_, "Shelf"), 7);
+    EXPECT_EQ(session.commit(), 0);
+    EXPECT_TRUE(read_text(file_) == text);
+}
+
+}  // namespace

@@ -1,0 +1,132 @@
+#include "quorelxmllib/legacy_list.h"
+
+#include <gtest/gtest.h>
+#include <locale.h>
+
+#include <cmath>
+#include <cstdlib>
+#include <limits>
+#include <numbers>
+#include <string>
+#include <vector>
+
+#include "support/diagnostics.h"
+
+namespace {
+
+using quo::list_format;
+using quo::scan_list;
+
+TEST(ListFormat, RepeatsTheItemAndEndsWithTheLast) {
+    EXPECT_EQ(list_format(3, 0), "%.15g, %.15g, %.15g");
+    EXPECT_EQ(list_format(2, 1), "%.15g, %.15g");
+    EXPECT_EQ(list_format(3, 2), "%d, %d, %d");
+    EXPECT_EQ(list_format(2, 3), "%s, \n%s");
+    EXPECT_EQ(list_format(1, 0), "%.15g");
+    EXPECT_EQ(list_format(0, 0), "");
+    EXPECT_EQ(list_format(2, 4), "");
+    EXPECT_EQ(list_format(2, -1), "");
+}
+
+TEST(ListFormat, IsCutToWholeItemsWithinItsRoom) {
+    for (int type = 0; type <= 3; ++type) {
+        const std::string format = list_format(100000, type), last = list_format(1, type);
+        EXPECT_LT(format.size(), 4096U);
+        EXPECT_GT(format.size(), 4080U);
+        EXPECT_TRUE(format.ends_with(" " + last) || format.ends_with("\n" + last));
+    }
+}
+
+struct ListCase {
+    const char *name, *text;
+    std::vector<double> values;
+};
+const double kInfinity = std::numeric_limits<double>::infinity();
+const ListCase kLists[] = {
+    {"Three", "1.5, 2.5, 3.5", {1.5, 2.5, 3.5}},
+    {"NoBlank", "1.5,2.5,3.5", {1.5, 2.5, 3.5}},
+    {"LinesAndLeadingBlanks", "\n  1.5,\n\t2.5,   3.5\n", {1.5, 2.5, 3.5}},
+    {"Exponents", "-1.25e-300, +4E3, 7.", {-1.25e-300, 4000.0, 7.0}},
+    {"Extremes", "1e999, -1e999, 1e-999", {kInfinity, -kInfinity, 0.0}},
+    {"EndsEarly", "1.5, 2.5", {1.5, 2.5}},
+    {"CommaLeftOver", "1.5, 2.5,", {1.5, 2.5}},
+    {"StopsAtWords", "1.5, two, 3.5", {1.5}},
+    {"StopsAtBlanksWithoutComma", "1.5 2.5 3.5", {1.5}},
+    {"BlankBeforeComma", "1.5 , 2.5", {1.5}},
+    {"Nothing", "", {}},
+    {"CommaOnly", ", 2.5", {}},
+    {"FormatCharacters", "%n%s, %n", {}},
+};
+
+TEST(ScanList, ReadsWhatFitsAndLeavesTheRest) {
+    for (const ListCase& row : kLists) {
+        SCOPED_TRACE(row.name);
+        std::vector<double> expected = row.values, values(3, -17.3);
+        expected.resize(3, -17.3);
+        EXPECT_EQ(scan_list(row.text, values.data(), 3), static_cast<int>(row.values.size()));
+        EXPECT_EQ(values, expected);
+    }
+}
+
+TEST(ScanList, NarrowsFloatsAndBoundsInts) {
+    float floats[2] = {};
+    EXPECT_EQ(scan_list("0.1, 1e300", floats, 2), 2);
+    EXPECT_EQ(floats[0], 0.1F);
+    EXPECT_TRUE(std::isinf(floats[1]));
+    std::int32_t ints[4] = {};
+    EXPECT_EQ(scan_list("-7, 2147483647, 3000000000, -3000000000", ints, 4), 4);
+    EXPECT_EQ(ints[0], -7);
+    EXPECT_EQ(ints[1], std::numeric_limits<std::int32_t>::max());
+    EXPECT_EQ(ints[2], std::numeric_limits<std::int32_t>::max());
+    EXPECT_EQ(ints[3], std::numeric_limits<std::int32_t>::min());
+}
+
+// Every length around the blocks of the scan, and one whose format would not fit into 4096 characters. Each number
+// must come back to the last bit.
+TEST(ScanList, ReadsListsOfAnyLength) {
+    for (const int count : {2, 31, 32, 33, 63, 64, 65, 96, 5001}) {
+        SCOPED_TRACE(count);
+        std::vector<double> expected;
+        std::string text;
+        for (int i = 0; i < count; ++i) {
+            char number[32];
+            std::snprintf(number, sizeof number, "%.15g", std::numbers::pi * std::pow(-1.37, i % 200) * (i + 1));
+            expected.push_back(std::strtod(number, nullptr));
+            (text += i ? ", " : "") += number;
+        }
+        std::vector<double> values(expected.size() + 1, -17.3);
+        EXPECT_EQ(scan_list(text.c_str(), values.data(), count), count);
+        EXPECT_EQ(scan_list(text.c_str(), values.data(), count + 1), count);
+        expected.push_back(-17.3);
+        EXPECT_EQ(values, expected);
+    }
+}
+
+TEST(ScanList, TakesNumbersOfAnyLength) {
+    for (const std::size_t digits : {200U, 511U, 512U, 5000U}) {
+        double values[2] = {-17.3, -17.3};
+        const std::string text = "0." + std::string(digits, '1') + "e" + std::string(digits, '0') + "1, 2.5";
+        EXPECT_GE(scan_list(text.c_str(), values, 2), 1);
+        EXPECT_NEAR(values[0], digits == 200 ? 1.0 / 0.9 : 1.0 / 9.0, 1e-15) << digits;
+    }
+}
+
+// A program that runs with a decimal comma once read 1.5 as 1.
+TEST(ScanList, TakesThePointWhateverTheLocale) {
+    const test::TemporaryFolder folder;
+    const std::string make = "localedef -i de_DE -f UTF-8 '" + folder.file("de_DE.UTF-8") + "' >/dev/null 2>&1";
+    if (std::system(make.c_str()) != 0) GTEST_SKIP() << "no locale with a decimal comma can be made";
+    setenv("LOCPATH", folder.path().c_str(), 1);
+    ASSERT_NE(setlocale(LC_ALL, "de_DE.UTF-8"), nullptr);
+    char comma[8];
+    std::snprintf(comma, sizeof comma, "%.1f", 1.5);
+    double values[3] = {};
+    const int read = scan_list("1.5, 2.5, 3.5", values, 3);
+    setlocale(LC_ALL, "C");
+    unsetenv("LOCPATH");
+    EXPECT_STREQ(comma, "1,5");
+    EXPECT_EQ(read, 3);
+    EXPECT_EQ(values[0] + 10 * values[1] + 100 * values[2], 376.5);
+}
+
+}  // namespace

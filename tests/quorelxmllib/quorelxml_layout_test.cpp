@@ -1,0 +1,200 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <libxml/xpath.h>
+
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "header_files.h"
+
+namespace {
+
+using test::header_text;
+using test::OpenDocument;
+using test::read_text;
+using test::write_text;
+
+/** A document with every shape that a path can meet: repeated channels and sections, a section without the field,
+ * namespaces, comments, elements inside values. */
+const char* const kShapes = R"(<QuorelXmlDoc xmlns:x="urn:x">
+  <NumberOfChannels>3</NumberOfChannels><Description/>
+  <Channel Number="1"><Sec><a>1</a><!-- a --><a>2<b>3</b></a></Sec><x:Sec><a>4</a></x:Sec><Other/></Channel>
+  <Group><Channel Number="1"><Sec><a>5</a></Sec></Channel></Group>
+  <Channel Number="01"><Sec><a>6</a></Sec></Channel>
+  <Channel x:Number="1"><Sec><a>7</a></Sec></Channel>
+  <Channel Number="2"/>
+  <Channel Number="1"><Sec xmlns="urn:y"><a>8</a></Sec><Sec/><Sec><c><a>9</a></c><a>10</a><x:a>11</x:a></Sec></Channel>
+  <Channel Number="-5"><Sec><a><val N="1">12</val><val>13</val></a></Sec></Channel>
+</QuorelXmlDoc>)";
+
+class QuorelxmlLayout : public testing::Test {
+protected:
+    OpenDocument& load(const std::string& text) {
+        write_text(file_, text);
+        document_.initXmlFile(file_.c_str());
+        return document_;
+    }
+    std::string saved() {
+        EXPECT_EQ(document_.write(), 0);
+        return read_text(file_);
+    }
+    test::TemporaryFolder folder_;
+    const std::string file_ = folder_.file("header.xml");
+    OpenDocument document_;
+};
+
+/** The nodes that libxml2's own evaluation of an expression finds. */
+std::vector<void*> evaluated(void* any_node, const std::string& expression) {
+    const std::unique_ptr<xmlXPathContext, decltype(&xmlXPathFreeContext)> context{
+        xmlXPathNewContext(static_cast<xmlNode*>(any_node)->doc), &xmlXPathFreeContext};
+    const std::unique_ptr<xmlXPathObject, decltype(&xmlXPathFreeObject)> result{
+        xmlXPathEvalExpression(reinterpret_cast<const xmlChar*>(expression.c_str()), context.get()),
+        &xmlXPathFreeObject};
+    std::vector<void*> nodes;
+    for (int i = 0; result && result->nodesetval && i < result->nodesetval->nodeNr; ++i)
+        nodes.push_back(result->nodesetval->nodeTab[i]);
+    return nodes;
+}
+
+// The documentation states look-ups as XPath expressions: walking must find the same nodes in the same order.
+TEST_F(QuorelxmlLayout, FindsWhatTheDocumentedExpressionFinds) {
+    const OpenDocument& document = load(kShapes);
+    int found = 0;
+    for (const int channel : {1, 2, 3, -5})
+        for (const char* field :
+             {"", "Sec", "Sec/a", "Sec/a/b", "Sec/a/val", "Sec/c", "Sec/c/a", "Other", "a", "x"}) {
+            std::string expression;
+            OpenDocument::setXpathExpression(channel, field, expression);
+            SCOPED_TRACE(expression);
+            const auto nodes = evaluated(document.getNode(1, ""), expression);
+            const int count = static_cast<int>(nodes.size());
+            EXPECT_EQ(document.countNodes(channel, field), count);
+            for (int i = 0; i < count; ++i)
+                EXPECT_EQ(document.getNode(channel, field, i), nodes[static_cast<std::size_t>(i)]);
+            EXPECT_EQ(document.getNode(channel, field, count), nullptr);
+            EXPECT_EQ(document.getNode(channel, field, -1), nullptr);
+            EXPECT_EQ(document.getNode(channel, field), count ? nodes.front() : nullptr);
+            EXPECT_EQ(document.fieldExists(channel, field), count > 0);
+            EXPECT_TRUE(document.fieldHasCount(channel, field, count));
+            EXPECT_FALSE(document.fieldHasCount(channel, field, count + 1));
+            found += count;
+        }
+    EXPECT_EQ(found, 18);
+    EXPECT_TRUE(document.channelExists(2));
+    EXPECT_FALSE(document.channelExists(3));
+}
+
+// Names come from callers and files: as part of an expression these would find the description, every section or
+// somebody else's channel.
+TEST_F(QuorelxmlLayout, TakesPathsAsNamesOnly) {
+    const OpenDocument& document = load(kShapes);
+    for (const char* field :
+         {"..", "*", "../Description", "Sec[1]", "Sec/*", "@Number", "Sec//a", "//a", "/Sec/a", "Sec/a/",
+          "Sec/a/text()", "node()", "Sec|Other", "x:Sec", "Sec/x:a", "\"]|//*[\"", ".", "Sec/./a"}) {
+        EXPECT_EQ(document.countNodes(1, field), 0) << field;
+        std::int32_t value = -17;
+        EXPECT_EQ(document_.readInt(1, field, &value, 1), 1) << field;
+    }
+}
+
+TEST_F(QuorelxmlLayout, CountsTheChannelsItAdds) {
+    OpenDocument& document = load(header_text(""));
+    EXPECT_EQ(document.createChannel(1), 0);
+    EXPECT_EQ(document.numberOfChannels(), 1);
+    EXPECT_EQ(document.createChannel(-2), 0);
+    EXPECT_EQ(document.createField(7, "a"), 0);
+    EXPECT_EQ(document.numberOfChannels(), 3);
+    const std::string text = saved();
+    EXPECT_NE(text.find("<NumberOfChannels>3</NumberOfChannels>"), std::string::npos);
+    EXPECT_NE(text.find("  </Channel>\n  <Channel Number=\"-2\"/>\n  <Channel Number=\"7\">\n    <a/>\n"),
+              std::string::npos);
+
+    for (const char* count : {"2147483647", "-2147483648", "many", ""}) {
+        std::string other = header_text("");
+        other.replace(other.find(">1<"), 3, std::string{">"} + count + "<");
+        EXPECT_EQ(load(other).createChannel(2), 0) << count;
+        EXPECT_TRUE(document_.channelExists(2));
+    }
+}
+
+TEST_F(QuorelxmlLayout, MakesADocumentForTheFirstField) {
+    const std::int32_t value = 5;
+    EXPECT_EQ(document_.writeInt(1, "a", &value, 1), 0) << "nothing had been loaded";
+    EXPECT_TRUE(document_.isRecognized());
+    EXPECT_EQ(load("<Other><a/></Other>").writeInt(1, "a", &value, 1), 0);
+    EXPECT_NE(saved().find("<Channel Number=\"1\">\n    <a>5</a>"), std::string::npos);
+}
+
+struct Creation {
+    const char *name, *before, *field;
+    int count;
+    const char* after;
+};
+constexpr Creation kCreations[] = {
+    {"Chain", "", "Sec/Arr/val", 1, "<Sec><Arr><val/></Arr></Sec>"},
+    {"ArrayOfValues", "", "Sec/Arr/val", 3, "<Sec><Arr><val/><val/><val/></Arr></Sec>"},
+    {"TextsOfTheChannel", "", "t", 2, "<t/><t/>"},
+    {"OnlyWhatIsMissing", "<Sec><t>x</t></Sec>", "Sec/t", 3, "<Sec><t>x</t><t/><t/></Sec>"},
+    {"NothingWhenEnough", "<Sec><t/><t/></Sec>", "Sec/t", 2, "<Sec><t/><t/></Sec>"},
+    {"FirstParentThatIsThere", "<Sec/><Sec><Arr/></Sec>", "Sec/Arr/val", 2,
+     "<Sec/><Sec><Arr><val/><val/></Arr></Sec>"},
+    {"CountsInEveryParent", "<Sec><t/></Sec><Sec><t/></Sec>", "Sec/t", 3, "<Sec><t/><t/></Sec><Sec><t/></Sec>"},
+    {"AppendsToTheFirstParent", "<Sec/><Sec/>", "Sec/t", 1, "<Sec><t/></Sec><Sec/>"},
+    {"InsideBlanks", "<Sec> \n </Sec>", "Sec/t", 1, "<Sec><t/></Sec>"},
+    {"BesideText", "<Sec>1, 2</Sec>", "Sec/val", 2, "<Sec>1, 2<val/><val/></Sec>"},
+    {"LikeNamedSection", "<x:Sec xmlns:x=\"urn:x\"/>", "Sec/t", 1, "<x:Sec xmlns:x=\"urn:x\"/><Sec><t/></Sec>"},
+};
+
+/** Text inside the channel without line breaks and indentation. */
+std::string inside(std::string text) {
+    const auto start = text.find("<Channel Number=\"1\">") + 20;
+    text = text.substr(start, text.find("</Channel>") - start);
+    std::string flat;
+    for (std::size_t i = 0; i < text.size(); ++i) {
+        if (text[i] == '\n')
+            while (i + 1 < text.size() && text[i + 1] == ' ') ++i;
+        else
+            flat += text[i];
+    }
+    return flat;
+}
+
+TEST_F(QuorelxmlLayout, CreatesWhatIsMissingWhereItBelongs) {
+    for (const Creation& row : kCreations) {
+        SCOPED_TRACE(row.name);
+        EXPECT_EQ(load(header_text(row.before)).createField(1, row.field, row.count), 0);
+        EXPECT_EQ(inside(saved()), row.after);
+        EXPECT_TRUE(document_.fieldHasCount(1, row.field, row.count));
+    }
+}
+
+TEST_F(QuorelxmlLayout, RemovesAWholeField) {
+    const char* const text = "<Sec><a/>t</Sec><Keep><Sec/></Keep><Sec/><Sec>u</Sec>";
+    EXPECT_EQ(load(header_text(text)).clearField(1, "None"), 0);
+    EXPECT_EQ(document_.clearField(2, "Sec"), 0);
+    EXPECT_EQ(document_.countNodes(1, "Sec"), 3);
+    EXPECT_EQ(document_.clearField(1, "Sec"), 0);
+    EXPECT_EQ(inside(saved()), "<Keep><Sec/></Keep>");
+}
+
+TEST_F(QuorelxmlLayout, ShowsTheScanFormat) {
+    EXPECT_EQ(document_.setFormat(3, 0), 0);
+    EXPECT_EQ(document_.format(), "%.15g, %.15g, %.15g");
+    EXPECT_EQ(document_.setFormat(2, 9), 1);
+}
+
+// With a look-up or a count per value this would take minutes.
+TEST_F(QuorelxmlLayout, HandlesLongArrays) {
+    constexpr int kCount = 200000;
+    std::vector<std::int32_t> values(kCount), back(kCount);
+    for (int i = 0; i < kCount; ++i) values[static_cast<std::size_t>(i)] = 7 * i - 3;
+    OpenDocument& document = load(header_text(""));
+    EXPECT_EQ(document.writeInt(1, "Sec/Arr", values.data(), kCount), 0);
+    EXPECT_EQ(document.write(), 0);
+    EXPECT_EQ(document.initXmlFile(file_.c_str()), 0);
+    EXPECT_EQ(document.readInt(1, "Sec/Arr", back.data(), kCount), 0);
+    EXPECT_EQ(back, values);
+}
+
+}  // namespace

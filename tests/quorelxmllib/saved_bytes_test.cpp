@@ -1,0 +1,122 @@
+#include <gtest/gtest.h>
+#include <libxml/parser.h>
+#include <libxml/tree.h>
+
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "header_files.h"
+
+namespace {
+
+using test::header_text;
+using test::OpenDocument;
+using test::read_text;
+using test::write_text;
+
+using Tree = std::unique_ptr<xmlDoc, decltype(&xmlFreeDoc)>;
+
+void save(xmlDoc* tree, const std::string& file) {
+    ASSERT_GT(xmlSaveFormatFileEnc(file.c_str(), tree, "UTF-8", 1), 0);
+}
+
+/** The documented way of writing, word for word: save, load without blank text nodes, save again. */
+std::string saved_twice(xmlDoc* tree, const std::string& file) {
+    save(tree, file);
+    const int before = xmlKeepBlanksDefault(0);
+    const Tree again{xmlParseFile(file.c_str()), &xmlFreeDoc};
+    xmlKeepBlanksDefault(before);
+    if (!again) return "not parsed";
+    save(again.get(), file);
+    return read_text(file);
+}
+
+void nothing(quorelxml&) {}
+void add_values(quorelxml& document) {
+    const double doubles[] = {1.5, 2.5, 1e-300};
+    const std::int32_t one = 7;
+    const char* texts[] = {"", " ", "a\r\n\t<&>\"'\xC3\xA8", "last"};
+    document.writeDouble(1, "Sec/Arr", doubles, 3);
+    document.writeInt(1, "Sec/one", &one, 1);
+    document.writeString(1, "Sec/texts", texts, 4);
+    document.writeString(1, "Sec/empty", texts, 1);
+    document.writeString(2, "blank", texts + 1, 1);
+}
+void add_under_blank_text(quorelxml& document) {
+    const char* blank = "  ";
+    const std::int32_t values[] = {1, 2};
+    document.writeString(1, "Sec/b", &blank, 1);
+    document.writeInt(1, "Sec/b", values, 2);
+    document.writeInt(1, "Blank", values, 2);
+}
+void add_beside_text(quorelxml& document) {
+    const std::int32_t values[] = {1, 2, 3};
+    document.writeInt(1, "List", values, 3);
+}
+void replace_array_by_text(quorelxml& document) {
+    const char* text = "now a text";
+    add_values(document);
+    document.writeString(1, "Sec/Arr", &text, 1);
+    document.writeString(1, "Mixed", &text, 1);
+}
+void remove_section(quorelxml& document) {
+    auto& open = static_cast<OpenDocument&>(document);
+    open.clearField(1, "Sec");
+    open.clearField(1, "Blank");
+    open.clearField(1, "Only");
+}
+
+struct Edit {
+    const char* name;
+    void (*apply)(quorelxml&);
+};
+constexpr Edit kEdits[] = {{"Nothing", nothing},
+                           {"Values", add_values},
+                           {"UnderBlankText", add_under_blank_text},
+                           {"BesideText", add_beside_text},
+                           {"TextForArray", replace_array_by_text},
+                           {"Removal", remove_section}};
+
+struct Origin {
+    const char *name, *inside;
+};
+constexpr Origin kOrigins[] = {
+    {"Empty", ""},
+    {"Indented", "    <Sec>\n      <one>1</one>\n    </Sec>\n"},
+    {"OneLine", "<Sec><one>1</one><Arr><val N=\"1\">4</val></Arr></Sec><Only/>"},
+    {"WideIndent", "\n\n\t\t<Sec>\n\n\n<one> 1 </one>\n</Sec>   \n<Blank>   </Blank>"},
+    {"Mixed", "<Mixed>text <b>x</b>  <i> </i> tail</Mixed><Mixed> <b/>text</Mixed>"},
+    {"Comments", "<!-- a --><Sec><!-- b\n  b --><one/><?p i?></Sec>  <!-- c -->"},
+    {"Cdata", "<Sec><![CDATA[ <x> ]]></Sec><Sec><![CDATA[]]></Sec><Only><![CDATA[  ]]></Only>"},
+    {"Preserved", "<Sec xml:space=\"preserve\">  <one/>  </Sec>"},
+    {"Lists", "<List>1, 2, 3</List><Blank>&#32;</Blank>"},
+    {"Entities", "<Sec>&amp;&#65;&lt;&#xE8;&#13;</Sec><Only a=\"&#10;&quot;\"/>"},
+    {"Namespaces", "<x:Sec xmlns:x=\"urn:x\"><x:one/></x:Sec><Sec xmlns=\"urn:y\"><one/></Sec>"},
+};
+
+class SavedBytes : public testing::TestWithParam<std::tuple<Origin, Edit>> {};
+
+// One save must put on the disk what saving, loading and saving again would put there.
+TEST_P(SavedBytes, AreThoseOfSavingTwice) {
+    const auto& [origin, edit] = GetParam();
+    const test::TemporaryFolder folder;
+    const std::string file = folder.file("header.xml"), literal = folder.file("literal.xml");
+    write_text(file, header_text(origin.inside));
+    OpenDocument document{file.c_str()};
+    edit.apply(document);
+    auto* const tree = static_cast<xmlNode*>(document.getNode(1, ""))->doc;
+    const std::string expected = saved_twice(tree, literal);
+    EXPECT_EQ(document.write(), 0);
+    EXPECT_EQ(read_text(file), expected);
+
+    const Tree again{xmlReadFile(file.c_str(), nullptr, XML_PARSE_NOBLANKS), &xmlFreeDoc};
+    EXPECT_EQ(saved_twice(again.get(), literal), expected) << "the file must not change by being opened and saved";
+}
+INSTANTIATE_TEST_SUITE_P(Documents, SavedBytes,
+                         testing::Combine(testing::ValuesIn(kOrigins), testing::ValuesIn(kEdits)),
+                         [](const auto& row) {
+                             return std::string{std::get<0>(row.param).name} + std::get<1>(row.param).name;
+                         });
+
+}  // namespace
