@@ -30,6 +30,7 @@ struct Refusal {
     const char* name;
     std::vector<std::string> arguments;
 };
+void PrintTo(const Refusal& row, std::ostream* stream) { *stream << row.name; }
 const Refusal kWrongUses[] = {
     {"NoSubcommand", {}},
     {"UnknownSubcommand", {"geocode"}},
@@ -72,6 +73,7 @@ struct FailedJob {
     std::string header, table, cause;  // an empty table: the job is `orbit`
     std::vector<std::string> options = {};
 };
+void PrintTo(const FailedJob& row, std::ostream* stream) { *stream << row.name; }
 
 class Failing : public testing::TestWithParam<FailedJob> {
 protected:

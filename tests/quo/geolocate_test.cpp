@@ -187,6 +187,7 @@ TEST(Geolocate, ReadsTheTableInWhateverClothesItComes) {
 struct BadRow {
     const char *name, *row, *status, *cause;
 };
+void PrintTo(const BadRow& row, std::ostream* stream) { *stream << row.name; }
 constexpr BadRow kBadRows[] = {
     {"BeyondTheHorizon", "1167930370.5,0.03,0", "10", "status 10"},
     {"AboveTheGround", "1167930370.5,0.001,0", "10", "status 10"},

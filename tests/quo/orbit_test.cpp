@@ -9,7 +9,6 @@ namespace {
 using test::Csv;
 using test::quo;
 using test::scene_file;
-using test::Vec3;
 
 class Orbit : public testing::Test {
 protected:

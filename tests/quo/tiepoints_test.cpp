@@ -19,6 +19,7 @@ struct Limits {
     const char* against;
     std::int64_t points;
 };
+void PrintTo(const Limits& row, std::ostream* stream) { *stream << row.scene; }
 const Limits kLimits[] = {
     {"s1a_iw1_slc_20220104_asc", 2.0, 1e-5, 0.02, 1e-6, "geocentric radius", 210},
     {"s1a_iw_grd_20201127_desc_sea", 2.0, 1e-5, 0.02, 1e-6, "geocentric radius", 210},

@@ -11,6 +11,7 @@ using test::quo;
 struct Pair {
     const char *name, *given, *seconds, *date;
 };
+void PrintTo(const Pair& row, std::ostream* stream) { *stream << row.name; }
 // Days and leap years of the calendar; the microseconds are those of real product times, whose doubles lie a
 // little below or above the decimal value.
 constexpr Pair kPairs[] = {

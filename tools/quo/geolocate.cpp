@@ -121,7 +121,7 @@ private:
 /** A name for a computed column that no column of the table bears yet. */
 std::string free_name(const Table& table, std::string name) {
     const auto& taken = table.columns();
-    while (std::find(taken.begin(), taken.end(), name) != taken.end()) name = "computed_" + name;
+    while (std::find(taken.begin(), taken.end(), name) != taken.end()) name.insert(0, "computed_");
     return name;
 }
 

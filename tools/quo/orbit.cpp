@@ -117,7 +117,10 @@ std::string as_text(Scene& scene, const std::vector<std::string>& findings) {
 
     constexpr std::size_t kWidth = 15;
     std::string text;
-    for (const auto& [name, value] : facts) text += name + std::string(kWidth - name.size(), ' ') + value + "\n";
+    for (const auto& [name, value] : facts) {
+        text += name;
+        text.append(kWidth - name.size(), ' ').append(value) += '\n';
+    }
     return text;
 }
 

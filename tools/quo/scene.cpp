@@ -29,6 +29,7 @@ std::vector<std::string> check(const GeneralSAROrbit& orbit) {
     std::vector<SVFinding> findings;
     std::vector<std::string> texts;
     if (orbit.SVCheck(findings) != 0) return {"the state vectors cannot be checked"};
+    texts.reserve(findings.size());
     for (const SVFinding& finding : findings) texts.emplace_back(finding.text);
     return texts;
 }
