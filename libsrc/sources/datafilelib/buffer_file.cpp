@@ -1,0 +1,363 @@
+#include <algorithm>
+#include <cerrno>
+#include <cstring>
+#include <new>
+#include <string>
+#include <string_view>
+
+#include "datafilelib/raster_region.h"
+#include "datafilelib/raster_stream.h"
+#include "datafilelib/sample_kernels.h"
+#include "quo_base/datafile.h"
+#include "sarutillib/bounded_text.h"
+#include "sarutillib/checked_size.h"
+
+namespace {
+
+constexpr std::string_view kSideSuffix = ".hdr";
+
+/** Requests that fail are ignored, so nothing may be left in errno for the next tracked function to report. */
+class QuietErrno {
+public:
+    ~QuietErrno() { errno = 0; }
+};
+
+}  // namespace
+
+BufferFile::BufferFile() : BufferFile{""} {}
+BufferFile::BufferFile(const char* file_name) : stream_{std::make_unique<quo::RasterStream>()} {
+    CellType = CELL_NOT_SET;
+    setFilename(file_name);
+}
+BufferFile::~BufferFile() { close(); }
+
+void BufferFile::setFilename(const char* file_name) { quo::copy_bounded(name_, quo::text_or_empty(file_name)); }
+void BufferFile::getFilename(char* file_name) const { quo::copy_bounded(file_name, sizeof name_, name_); }
+bool BufferFile::is_open() const { return stream_->is_open(); }
+bool BufferFile::exists() const { return quo::raster_exists(name_); }
+
+int BufferFile::readhdr(const char* header_name) {
+    const QuietErrno quiet;
+    close();
+    std::string_view name = quo::text_or_empty(header_name);
+    name.remove_suffix(std::min(name.size(), kSideSuffix.size()));
+    quo::copy_bounded(name_, name);
+    return readSection(header_name);
+}
+int BufferFile::readhdr() { return readhdr((std::string{name_} + std::string{kSideSuffix}).c_str()); }
+int BufferFile::writehdr() { return writehdr((std::string{name_} + std::string{kSideSuffix}).c_str()); }
+int BufferFile::writehdr(const char* header_name) { return writeSection(header_name); }
+
+void BufferFile::open(int mode) {
+    const QuietErrno quiet;
+    close();
+    using Mode = quo::RasterStream::Mode;
+    constexpr Mode kModes[] = {Mode::kRead, Mode::kCreateAndRead, Mode::kUpdate};
+    if (mode < READ || mode > READ_WRITE || !stream_->open(name_, kModes[mode - READ])) return;
+    mode_ = mode;
+}
+
+void BufferFile::initbuffer(int size, int keep) {
+    const QuietErrno quiet;
+    if (size < 1 || !is_open()) return;
+    flush();
+    buffer_.reset(new (std::nothrow) char[static_cast<std::size_t>(size)]());
+    size_ = buffer_ ? size : 0;
+    keep_ = mode_ == READ ? std::clamp(keep, 0, size - 1) : 0;
+    start_ = cursor_ = fill_ = 0;
+    if (buffer_ && mode_ != WRITE) loadWindow(0);
+}
+
+void BufferFile::close() {
+    const QuietErrno quiet;
+    flush();
+    buffer_.reset();
+    size_ = keep_ = start_ = cursor_ = fill_ = 0;
+    stream_->close();
+    mode_ = NOT_OPEN;
+}
+
+int64_t BufferFile::place() const { return start_ + cursor_; }
+
+int64_t BufferFile::tell() const { return buffer_ && mode_ == READ_WRITE ? start_ : place(); }
+
+// Bytes [first, last) of the buffer are newer than the file's. One range is kept: what lies between two changes is
+// valid in the buffer and may be written again.
+void BufferFile::markWritten(int64_t first, int64_t last) {
+    if (dirty_first_ == dirty_last_) {
+        dirty_first_ = first;
+        dirty_last_ = last;
+    } else {
+        dirty_first_ = std::min(dirty_first_, first);
+        dirty_last_ = std::max(dirty_last_, last);
+    }
+}
+
+bool BufferFile::flush() {
+    const auto pending = static_cast<std::size_t>(dirty_last_ - dirty_first_);
+    if (pending == 0) return true;
+    const std::size_t written = stream_->write_at(start_ + dirty_first_, buffer_.get() + dirty_first_, pending);
+    dirty_first_ = dirty_last_ = 0;
+    return written == pending;
+}
+
+// Makes the buffer start at `start`, holding what the file has there.
+void BufferFile::loadWindow(int64_t start) {
+    start_ = start;
+    fill_ = static_cast<int64_t>(stream_->read_at(start, buffer_.get(), static_cast<std::size_t>(size_)));
+    std::memset(buffer_.get() + fill_, 0, static_cast<std::size_t>(size_ - fill_));
+}
+
+void BufferFile::dropBuffer(int64_t next) {
+    start_ = next;
+    cursor_ = fill_ = 0;
+    if (buffer_) std::memset(buffer_.get(), 0, static_cast<std::size_t>(size_));
+}
+
+void BufferFile::moveTo(int64_t target) {
+    if (target < 0) return;
+    if (!buffer_) {
+        start_ = target;
+        return;
+    }
+    const int64_t last = mode_ == READ ? fill_ : size_;
+    if (target >= start_ && target <= start_ + last) {
+        cursor_ = target - start_;
+        return;
+    }
+    flush();
+    const int64_t before = mode_ == READ ? keep_ : size_ / 2;
+    loadWindow(std::max<int64_t>(target - before, 0));
+    cursor_ = target - start_;
+}
+
+void BufferFile::seek(int64_t offset, int type) {
+    const QuietErrno quiet;
+    if (offset == 0 || !is_open()) return;  // deliberate: an offset of 0 changes nothing
+    int64_t base = 0;
+    if (type == FROM_CURRENT) {
+        base = place();
+    } else if (type == FROM_END) {
+        // The end is that of a plain file: pending bytes may lie beyond the end on the disk.
+        base = std::max(stream_->length().value_or(0), dirty_last_ > dirty_first_ ? start_ + dirty_last_ : 0);
+    } else if (type != FROM_START) {
+        return;
+    }
+    const auto target = (quo::Checked<int64_t>{base} + offset).value();
+    if (target) moveTo(*target);
+}
+
+// Slides the buffer forward, keeping a few bytes that were passed. False when nothing follows.
+bool BufferFile::advanceForReading() {
+    flush();
+    const int64_t kept = std::min(keep_, fill_ / 2);
+    const int64_t end = start_ + fill_;
+    if (cursor_ > fill_) return false;  // a seek went beyond the end of the file
+    std::memmove(buffer_.get(), buffer_.get() + fill_ - kept, static_cast<std::size_t>(kept));
+    const auto read =
+        static_cast<int64_t>(stream_->read_at(end, buffer_.get() + kept, static_cast<std::size_t>(size_ - kept)));
+    start_ = end - kept;
+    cursor_ = kept;
+    fill_ = kept + read;
+    std::memset(buffer_.get() + fill_, 0, static_cast<std::size_t>(size_ - fill_));
+    return read > 0;
+}
+
+int BufferFile::read(void* dst, int n) {
+    const QuietErrno quiet;
+    if (!is_open() || mode_ == WRITE || n < 1) return 0;
+    auto* to = static_cast<char*>(dst);
+    if (!buffer_) {
+        const auto moved = static_cast<int>(stream_->read_at(start_, to, static_cast<std::size_t>(n)));
+        start_ += moved;
+        return moved;
+    }
+    int64_t done = 0;
+    while (done < n) {
+        const int64_t part = std::min(n - done, std::max<int64_t>(fill_ - cursor_, 0));
+        std::memcpy(to + done, buffer_.get() + std::min(cursor_, size_), static_cast<std::size_t>(part));
+        cursor_ += part;
+        done += part;
+        if (done < n && !advanceForReading()) break;
+    }
+    return static_cast<int>(done);
+}
+
+// Writes what does not fit: the buffer is filled to its end and flushed, then placed so that the tail of the data
+// lies in its first half. Returns the bytes taken.
+int64_t BufferFile::slideForWriting(const char* src, int64_t n) {
+    const int64_t fits = size_ - cursor_;
+    std::memcpy(buffer_.get() + cursor_, src, static_cast<std::size_t>(fits));
+    markWritten(cursor_, size_);
+    const int64_t end = start_ + size_;
+    if (!flush()) return 0;
+    const int64_t half = size_ / 2, rest = n - fits, direct = std::max<int64_t>(rest - half, 0);
+    const auto bytes = static_cast<std::size_t>(direct);
+    if (stream_->write_at(end, src + fits, bytes) != bytes) return fits;
+    const int64_t tail = rest - direct;
+    loadWindow(end + rest - half);
+    std::memcpy(buffer_.get() + half - tail, src + n - tail, static_cast<std::size_t>(tail));
+    if (tail > 0) markWritten(half - tail, half);
+    cursor_ = half;
+    fill_ = std::max(fill_, half);
+    return n;
+}
+
+int BufferFile::write(const void* src, int n) {
+    const QuietErrno quiet;
+    if (!is_open() || mode_ == READ || n < 1) return 0;
+    const auto* from = static_cast<const char*>(src);
+    if (!buffer_) {
+        const auto moved = static_cast<int>(stream_->write_at(start_, from, static_cast<std::size_t>(n)));
+        start_ += moved;
+        return moved;
+    }
+    if (n > size_ - cursor_) return static_cast<int>(slideForWriting(from, n));
+    std::memcpy(buffer_.get() + cursor_, from, static_cast<std::size_t>(n));
+    markWritten(cursor_, cursor_ + n);
+    cursor_ += n;
+    fill_ = std::max(fill_, cursor_);
+    return n;
+}
+
+void BufferFile::readBlock(void* dst, int memory_type, int first_line, int lines, int first_sample, int samples) {
+    const QuietErrno quiet;
+    const auto kernel = quo::find_kernel(quo::SampleAccess::kBlockRead, CellType, memory_type);
+    if (samples == 0) samples = NrOfPixelsPerLine;
+    const auto region = quo::region_of_samples(*this, first_line, lines, first_sample, samples);
+    if (!is_open() || !kernel || !region) return;
+    flush();
+    const auto piece = samples * static_cast<int64_t>(quo::sample_size(memory_type));
+    if (quo::read_region(*stream_, *region, {kernel, samples, piece, piece, ByteOrder == 1},
+                         static_cast<char*>(dst)) == QUO_OK) {
+        dropBuffer(quo::line_after(*this, first_line, lines));
+    }
+}
+
+void BufferFile::writeBlock(const void* src, int memory_type, int first_line, int lines, int first_sample,
+                            int samples) {
+    const QuietErrno quiet;
+    const auto kernel = quo::find_kernel(quo::SampleAccess::kBlockWrite, CellType, memory_type);
+    // Two doubles of a FLOAT64 file take one complex sample.
+    const int per_sample = memory_type == FLOAT_COMPLEX && CellType == FLOAT64 ? 2 : 1;
+    if (samples == 0) samples = NrOfPixelsPerLine / per_sample;
+    const auto region =
+        quo::region_of_samples(*this, first_line, lines, first_sample, int64_t{samples} * per_sample);
+    if (!is_writing() || !kernel || !region || samples < 0) return;
+    flush();
+    const auto piece = samples * static_cast<int64_t>(quo::sample_size(memory_type));
+    quo::write_region(*stream_, *region, {kernel, samples, piece, piece, ByteOrder == 1},
+                      static_cast<const char*>(src));
+    dropBuffer(quo::line_after(*this, first_line, lines));
+}
+
+void BufferFile::readbuffer(float* dst, int line, int lines, int sample, int samples) {
+    readBlock(dst, FLOAT32, line, lines, sample, samples);
+}
+void BufferFile::readbuffer(double* dst, int line, int lines, int sample, int samples) {
+    readBlock(dst, FLOAT64, line, lines, sample, samples);
+}
+void BufferFile::readbuffer(int* dst, int line, int lines, int sample, int samples) {
+    readBlock(dst, INT32, line, lines, sample, samples);
+}
+void BufferFile::readbuffer(short* dst, int line, int lines, int sample, int samples) {
+    readBlock(dst, INT16, line, lines, sample, samples);
+}
+void BufferFile::readbuffer(fcomplex* dst, int line, int lines, int sample, int samples) {
+    readBlock(dst, FLOAT_COMPLEX, line, lines, sample, samples);
+}
+void BufferFile::readbuffer(dcomplex* dst, int line, int lines, int sample, int samples) {
+    readBlock(dst, DOUBLE_COMPLEX, line, lines, sample, samples);
+}
+void BufferFile::writebuffer(const float* src, int line, int lines, int sample, int samples) {
+    writeBlock(src, FLOAT32, line, lines, sample, samples);
+}
+void BufferFile::writebuffer(const double* src, int line, int lines, int sample, int samples) {
+    writeBlock(src, FLOAT64, line, lines, sample, samples);
+}
+void BufferFile::writebuffer(const int* src, int line, int lines, int sample, int samples) {
+    writeBlock(src, INT32, line, lines, sample, samples);
+}
+void BufferFile::writebuffer(const short* src, int line, int lines, int sample, int samples) {
+    writeBlock(src, INT16, line, lines, sample, samples);
+}
+void BufferFile::writebuffer(const fcomplex* src, int line, int lines, int sample, int samples) {
+    writeBlock(src, FLOAT_COMPLEX, line, lines, sample, samples);
+}
+void BufferFile::writebuffer(const dcomplex* src, int line, int lines, int sample, int samples) {
+    writeBlock(src, DOUBLE_COMPLEX, line, lines, sample, samples);
+}
+
+bool BufferFile::prefixRegion(int first_line, int lines, quo::RasterRegion& region) const {
+    const auto found = quo::region_of_prefixes(*this, first_line, lines);
+    if (found) region = *found;
+    return is_open() && found.has_value();
+}
+
+void BufferFile::readprefix(char* dst, int first_line, int lines) {
+    const QuietErrno quiet;
+    quo::RasterRegion region;
+    if (!prefixRegion(first_line, lines, region)) return;
+    flush();
+    if (quo::read_region(*stream_, region, {nullptr, 0, region.piece, region.piece, false}, dst) == QUO_OK) {
+        dropBuffer(quo::line_after(*this, first_line, lines));
+    }
+}
+
+void BufferFile::writeprefix(const char* src, int first_line, int lines) {
+    const QuietErrno quiet;
+    quo::RasterRegion region;
+    if (!is_writing() || !prefixRegion(first_line, lines, region)) return;
+    flush();
+    quo::write_region(*stream_, region, {nullptr, 0, region.piece, region.piece, false}, src);
+    dropBuffer(quo::line_after(*this, first_line, lines));
+}
+
+void BufferFile::writeOffset(const char* src, int n) {
+    const QuietErrno quiet;
+    if (!is_writing() || n < 1 || HeaderOffset < 1) return;
+    const int64_t back = place();
+    flush();
+    stream_->write_at(0, src, static_cast<std::size_t>(std::min<int64_t>(n, HeaderOffset)));
+    if (buffer_) loadWindow(start_);
+    moveTo(back);
+}
+
+template <typename T>
+T BufferFile::readSample(int type, int line, int sample) {
+    const QuietErrno quiet;
+    const auto region = quo::region_of_samples(*this, line, 1, sample, 1);
+    T value{};
+    if (!is_open() || mode_ == WRITE || CellType != type || ByteOrder != 0 || !region) return value;
+    moveTo(region->first);
+    T found{};
+    return read(&found, static_cast<int>(sizeof found)) == static_cast<int>(sizeof found) ? found : value;
+}
+
+float BufferFile::readFloat(int line, int sample) { return readSample<float>(FLOAT32, line, sample); }
+double BufferFile::readDouble(int line, int sample) { return readSample<double>(FLOAT64, line, sample); }
+int BufferFile::readInt(int line, int sample) { return readSample<int>(INT32, line, sample); }
+short BufferFile::readShort(int line, int sample) { return readSample<short>(INT16, line, sample); }
+fcomplex BufferFile::readFloatComplex(int line, int sample) {
+    return readSample<fcomplex>(FLOAT_COMPLEX, line, sample);
+}
+dcomplex BufferFile::readDoubleComplex(int line, int sample) {
+    return readSample<dcomplex>(DOUBLE_COMPLEX, line, sample);
+}
+
+int BufferFile::clone(const BufferFile* source) {
+    if (source == this) return QUO_OK;
+    close();
+    quo::copy_bounded(name_, source->name_);
+    copyDescription(*source);
+    return QUO_OK;
+}
+
+int BufferFile::copy(const char* file_name, int overwrite) {
+    const QuietErrno quiet;
+    flush();
+    BufferFile target{file_name};
+    target.copyDescription(*this);
+    if (const int status = quo::copy_raster(name_, target.name_, overwrite != 0)) return status;
+    return target.writehdr();
+}

@@ -1,0 +1,433 @@
+#include "quo_base/datafile.h"
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <cstring>
+#include <limits>
+#include <new>
+#include <string>
+#include <string_view>
+
+#include "datafilelib/raster_region.h"
+#include "datafilelib/raster_stream.h"
+#include "datafilelib/sample_kernels.h"
+#include "diagnosticslib/call_frame.h"
+#include "quo_base/profile.h"
+#include "sarutillib/bounded_text.h"
+#include "sarutillib/checked_size.h"
+
+namespace {
+
+constexpr const char* kSource = "datafile";
+constexpr const char* kSection = "RasterInfo";
+constexpr const char* kReadFailed = "File reading failed!";
+constexpr const char* kWriteFailed = "File writing failed!";
+constexpr int kDescriptionElements = 6;
+
+struct CellName {
+    std::string_view name;
+    int code;
+};
+// In the order in which a side file's name is compared. Code 4 has no name.
+constexpr std::array<CellName, 9> kCellNames{{{"FLOAT32", FLOAT32},
+                                              {"INT32", INT32},
+                                              {"INT16", INT16},
+                                              {"FLOAT_COMPLEX", FLOAT_COMPLEX},
+                                              {"SHORT_COMPLEX", SHORT_COMPLEX},
+                                              {"DOUBLE_COMPLEX", DOUBLE_COMPLEX},
+                                              {"FLOAT64", FLOAT64},
+                                              {"INT8", INT8},
+                                              {"INT8_COMPLEX", INT8_COMPLEX}}};
+
+int code_of(std::string_view name) {
+    const auto* found = std::ranges::find(kCellNames, name, &CellName::name);
+    return found == kCellNames.end() ? -1 : found->code;
+}
+
+/** Reads the profile form of a side file, key by key; every key is read. */
+class ProfileForm {
+public:
+    explicit ProfileForm(const char* file) : file_{file} {}
+
+    void read(const char* key, std::int32_t& value) {
+        complete_ = GetParInt(file_, key, 1, &value, 0, kSection) == QUO_OK && complete_;
+    }
+    std::string_view read(const char* key) {
+        text_[0] = '\0';
+        complete_ = GetParString(file_, key, 1, text_, 0, kSection) == QUO_OK && complete_;
+        return text_;
+    }
+    [[nodiscard]] bool complete() const { return complete_; }
+
+private:
+    const char* file_;
+    char text_[512] = "";
+    bool complete_ = true;
+};
+
+// Statuses of a region transfer as entries of the report.
+int finish(quo::CallFrame& frame, int status) {
+    switch (status) {
+        case QUO_OK:
+            return frame.success();
+        case QUO_READ_FAILED:
+            return frame.fail(status, kReadFailed);
+        case QUO_WRITE_FAILED:
+            return frame.fail(status, kWriteFailed);
+        case QUO_NO_MEMORY:
+            return frame.fail(status, "Memory allocation failure");
+        case QUO_NOT_OPENED:
+            return frame.fail(status, "File not opened!");
+        default:
+            return frame.fail(status, "The request does not fit the raster");
+    }
+}
+
+bool converts(int cell_type) { return cell_type >= FLOAT_COMPLEX && cell_type <= INT16; }
+
+}  // namespace
+
+RasterDescription::RasterDescription() { createElementsVector(kDescriptionElements); }
+RasterDescription::~RasterDescription() = default;
+
+void RasterDescription::refreshParameters() {
+    addElementInt("NrOfLinesPerImage", &NrOfLinesPerImage, 1, 0, 0, true);
+    addElementInt("NrOfPixelsPerLine", &NrOfPixelsPerLine, 1, 0, 0, true);
+    addElementInt("HeaderOffset", &stored_offset_, 1, 0, 0, true);
+    addElementInt("RowPrefix", &RowPrefix, 1, 0, 0, true);
+    addElementInt("ByteOrder", &ByteOrder, 1, 0, 0, true);
+    addElementInt("CellType", &CellType, 1, 0, 0, true);
+    setAllocationFlag(true);
+}
+
+int RasterDescription::element_sizeof() const { return static_cast<int>(quo::sample_size(CellType)); }
+int RasterDescription::is_complex() const { return quo::is_complex_type(CellType) ? 1 : 0; }
+
+void RasterDescription::copyDescription(const RasterDescription& from) {
+    NrOfLinesPerImage = from.NrOfLinesPerImage;
+    NrOfPixelsPerLine = from.NrOfPixelsPerLine;
+    HeaderOffset = from.HeaderOffset;
+    RowPrefix = from.RowPrefix;
+    ByteOrder = from.ByteOrder;
+    CellType = from.CellType;
+}
+
+int64_t RasterDescription::rasterSize() const {
+    const auto region = quo::region_of_samples(*this, 0, NrOfLinesPerImage, 0, NrOfPixelsPerLine);
+    return region ? quo::line_after(*this, 0, NrOfLinesPerImage) : -1;
+}
+
+int RasterDescription::readSection(const char* side_file) {
+    stored_offset_ = 0;
+    const bool found = readAuxiliaryFile(side_file, 1, kSection);
+    if (found) HeaderOffset = stored_offset_;
+    return found ? QUO_OK : QUO_REFUSED;
+}
+
+int RasterDescription::writeSection(const char* side_file) {
+    if (HeaderOffset < std::numeric_limits<std::int32_t>::min() ||
+        HeaderOffset > std::numeric_limits<std::int32_t>::max()) {
+        return QUO_REFUSED;
+    }
+    stored_offset_ = static_cast<std::int32_t>(HeaderOffset);
+    return writeAuxiliaryFile(side_file, 1, kSection);
+}
+
+DataFile::DataFile() : stream_{std::make_unique<quo::RasterStream>()} {}
+DataFile::~DataFile() { close(); }
+
+std::string DataFile::sideFile() const { return std::string{FileName} + ".hdr"; }
+
+int DataFile::setFilename(const char* file_name) {
+    const std::string_view name = quo::text_or_empty(file_name);
+    if (name.size() >= sizeof FileName) return QUO_REFUSED;  // a cut name would be another file's
+    quo::copy_bounded(FileName, name);
+    return QUO_OK;
+}
+
+int DataFile::open(int mode) {
+    quo::CallFrame frame{"DataFile::open", kSource};
+    using Mode = quo::RasterStream::Mode;
+    constexpr struct {
+        Mode how;
+        int state;
+    } kModes[] = {{Mode::kRead, 0}, {Mode::kCreate, 1}, {Mode::kUpdate, 1}, {Mode::kUpdate, 2}};
+    if (mode < 0 || mode >= static_cast<int>(std::size(kModes))) return frame.success();
+    if (is_open()) {
+        const int wanted = BufferSize;
+        if (const int status = close()) return frame.callee(status);
+        BufferSize = wanted;
+    }
+    if (!stream_->open(FileName, kModes[mode].how)) return frame.fail(QUO_NOT_OPENED, "File not opened!");
+    state_ = kModes[mode].state;
+    position_ = 0;
+    cursor_ = fill_ = 0;
+    if (BufferSize > 0) {
+        buffer_.reset(new (std::nothrow) char[static_cast<std::size_t>(BufferSize)]);
+        if (!buffer_) {
+            stream_->close();
+            return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
+        }
+    }
+    return frame.success();
+}
+
+int DataFile::close() {
+    if (!is_open()) return QUO_OK;
+    quo::CallFrame frame{"DataFile::close", kSource};
+    // Deliberate: a file open for reading and writing drops what its buffer holds.
+    if (buffer_ && state_ == 1 && flushBuffer() != QUO_OK) return frame.fail(QUO_WRITE_FAILED, kWriteFailed);
+    buffer_.reset();
+    BufferSize = 0;
+    position_ = 0;
+    cursor_ = fill_ = 0;
+    if (!stream_->close()) return frame.fail(QUO_WRITE_FAILED, kWriteFailed);
+    return frame.success();
+}
+
+// Writes the pending bytes where the stream stands; the position moves past them.
+int DataFile::flushBuffer() {
+    const auto pending = static_cast<std::size_t>(cursor_);
+    if (stream_->write(buffer_.get(), pending) != pending) return QUO_WRITE_FAILED;
+    cursor_ = 0;
+    return QUO_OK;
+}
+
+int DataFile::refill() {
+    stream_->seek(position_);
+    fill_ = static_cast<std::int32_t>(stream_->read(buffer_.get(), static_cast<std::size_t>(BufferSize)));
+    cursor_ = 0;
+    return fill_;
+}
+
+int DataFile::seekWriting(int64_t offset) {
+    if (flushBuffer() != QUO_OK) return QUO_WRITE_FAILED;
+    const auto target = (quo::Checked<std::int64_t>{position_} + offset).value();
+    if (!target || *target < 0) return QUO_REFUSED;
+    position_ = *target;
+    fill_ = 0;
+    stream_->seek(position_);
+    return QUO_OK;
+}
+
+int DataFile::seekReading(int64_t offset, int whence) {
+    const auto target = (quo::Checked<std::int64_t>{whence == 0 ? 0 : position_} + offset).value();
+    if (whence == 0 && offset > position_ && offset < position_ + fill_) {
+        cursor_ = static_cast<std::int32_t>(offset - position_);
+        return QUO_OK;
+    }
+    const auto within = (quo::Checked<std::int64_t>{cursor_} + offset).value();
+    if (whence == 1 && within && *within >= 0 && *within < fill_) {
+        cursor_ = static_cast<std::int32_t>(*within);
+        return QUO_OK;
+    }
+    // Deliberate: relative targets count from the buffer's start here, not from the cursor.
+    if (!target || *target < 0) return QUO_REFUSED;
+    position_ = *target;
+    refill();
+    return QUO_OK;
+}
+
+int DataFile::seek(int64_t offset, int whence) {
+    quo::CallFrame frame{"DataFile::seek", kSource};
+    if (!is_open() || (whence != 0 && whence != 1)) return frame.fail(QUO_REFUSED, "No such place to seek from");
+    if (buffer_) {
+        const int status = state_ == 0 ? seekReading(offset, whence) : seekWriting(offset);
+        return finish(frame, status);
+    }
+    const auto target = (quo::Checked<std::int64_t>{whence == 0 ? 0 : position_} + offset).value();
+    if (!target || *target < 0) return frame.fail(QUO_REFUSED, "A place before the start of the file");
+    position_ = *target;
+    stream_->seek(position_);
+    return frame.success();
+}
+
+int DataFile::readBuffered(char* dst, int64_t n) {
+    while (n > 0) {
+        if (cursor_ >= fill_) {
+            position_ += fill_;
+            if (refill() == 0) return QUO_READ_FAILED;
+        }
+        const int64_t part = std::min<int64_t>(n, fill_ - cursor_);
+        std::memcpy(dst, buffer_.get() + cursor_, static_cast<std::size_t>(part));
+        cursor_ += static_cast<std::int32_t>(part);
+        dst += part;
+        n -= part;
+    }
+    return QUO_OK;
+}
+
+int DataFile::read(char* dst, int64_t n) {
+    quo::CallFrame frame{"DataFile::read", kSource};
+    if (!is_open() || state_ == 1 || n < 0) return frame.fail(QUO_REFUSED, "The file is not open for reading");
+    if (buffer_) return finish(frame, readBuffered(dst, n));
+    if (stream_->read(dst, static_cast<std::size_t>(n)) != static_cast<std::size_t>(n)) {
+        stream_->seek(position_);
+        return frame.fail(QUO_READ_FAILED, kReadFailed);
+    }
+    position_ += n;
+    return frame.success();
+}
+
+int DataFile::writeBuffered(const char* src, int64_t n) {
+    if (n < BufferSize - cursor_) {
+        std::memcpy(buffer_.get() + cursor_, src, static_cast<std::size_t>(n));
+        cursor_ += static_cast<std::int32_t>(n);
+        return QUO_OK;
+    }
+    const int32_t pending = cursor_;
+    if (flushBuffer() != QUO_OK) return QUO_WRITE_FAILED;
+    position_ += pending;
+    if (stream_->write(src, static_cast<std::size_t>(n)) != static_cast<std::size_t>(n)) return QUO_WRITE_FAILED;
+    position_ += n;
+    return QUO_OK;
+}
+
+int DataFile::write(const char* src, int64_t n) {
+    quo::CallFrame frame{"DataFile::write", kSource};
+    if (!is_open() || state_ == 0 || n < 0) return frame.fail(QUO_REFUSED, "The file is not open for writing");
+    if (buffer_) return finish(frame, writeBuffered(src, n));
+    if (stream_->write(src, static_cast<std::size_t>(n)) != static_cast<std::size_t>(n)) {
+        return frame.fail(QUO_WRITE_FAILED, kWriteFailed);
+    }
+    position_ += n;
+    return frame.success();
+}
+
+int64_t DataFile::tell() const { return buffer_ ? position_ + cursor_ : position_; }
+int DataFile::is_open() const { return stream_->is_open() ? 1 : 0; }
+int DataFile::is_buffered() const { return BufferSize > 0 ? 1 : 0; }
+int DataFile::is_writing() const { return state_; }
+int DataFile::exists() const { return quo::raster_exists(FileName) ? 1 : 0; }
+
+int DataFile::read_hdr(const char* file_name) {
+    quo::CallFrame frame{"DataFile::read_hdr", kSource};
+    if (const int status = close()) return frame.callee(status);
+    BufferSize = 0;
+    if (setFilename(file_name) != QUO_OK) return frame.fail(QUO_REFUSED, "File name too long");
+    const std::string side_file = sideFile();
+    if (readSection(side_file.c_str()) == QUO_OK) return frame.success();
+
+    ProfileForm form{side_file.c_str()};
+    std::int32_t offset = static_cast<std::int32_t>(HeaderOffset);
+    form.read("HeaderOffset", offset);
+    HeaderOffset = offset;
+    form.read("RowPrefix", RowPrefix);
+    form.read("NrOfPixelsPerLine", NrOfPixelsPerLine);
+    form.read("NrOfLinesPerImage", NrOfLinesPerImage);
+    CellType = code_of(form.read("CellType"));
+    // Deliberate: any other text, in any other letter case, means little-endian.
+    ByteOrder = form.read("ByteOrder") == "MSBFirst" ? 1 : 0;
+    if (!form.complete() || CellType < 0) return frame.fail(QUO_REFUSED, "The raster's side file is incomplete");
+    return frame.success();
+}
+
+int DataFile::write_hdr() {
+    quo::CallFrame frame{"DataFile::write_hdr", kSource};
+    if (writeSection(sideFile().c_str()) != QUO_OK) {
+        return frame.fail(QUO_REFUSED, "The raster's side file cannot be written");
+    }
+    return frame.success();
+}
+
+int DataFile::clone(const DataFile* source) {
+    quo::CallFrame frame{"DataFile::clone", kSource};
+    if (source == this) return frame.success();
+    if (const int status = close()) return frame.callee(status);
+    quo::copy_bounded(FileName, source->FileName);
+    copyDescription(*source);
+    BufferSize = source->BufferSize;
+    return frame.success();
+}
+
+int DataFile::copy(const char* file_name, int overwrite) {
+    quo::CallFrame frame{"DataFile::copy", kSource};
+    if (buffer_ && state_ != 0 && flushBuffer() != QUO_OK) return frame.fail(QUO_WRITE_FAILED, kWriteFailed);
+    DataFile target;
+    target.clone(this);
+    if (target.setFilename(file_name) != QUO_OK) return frame.fail(QUO_REFUSED, "File name too long");
+    if (const int status = quo::copy_raster(FileName, target.FileName, overwrite != 0))
+        return finish(frame, status);
+    if (const int status = target.write_hdr()) return frame.callee(status);
+    return frame.success();
+}
+
+// Contents come before the buffer's bookkeeping: pending bytes reach the file before a region is moved, and the
+// buffer starts anew at the line after it.
+int DataFile::prepareRegion(int64_t next) {
+    if (buffer_ && state_ != 0 && flushBuffer() != QUO_OK) return QUO_WRITE_FAILED;
+    position_ = next;
+    cursor_ = fill_ = 0;
+    stream_->seek(next);
+    return QUO_OK;
+}
+
+BufferIO::BufferIO(DataFile* file, int first_sample, int samples, int first_line, int lines, int memory_type)
+    : File{file},
+      FirstSample{first_sample},
+      Samples{samples},
+      FirstLine{first_line},
+      Lines{lines},
+      MemoryType{memory_type} {}
+
+int BufferIO::openForReading() { return File->is_open() ? QUO_OK : File->open(0); }
+
+bool BufferIO::prefixRegion(quo::RasterRegion& region) const {
+    const auto found = quo::region_of_prefixes(*File, FirstLine, Lines);
+    if (found) region = *found;
+    return found.has_value();
+}
+
+int BufferIO::readprefix(char* dst) {
+    quo::CallFrame frame{"BufferIO::readprefix", kSource};
+    if (const int status = openForReading()) return frame.callee(status);
+    quo::RasterRegion region;
+    if (File->state_ == 1 || !prefixRegion(region)) return finish(frame, QUO_REFUSED);
+    if (const int status = File->prepareRegion(quo::line_after(*File, FirstLine, Lines)))
+        return finish(frame, status);
+    return finish(frame,
+                  quo::read_region(*File->stream_, region, {nullptr, 0, region.piece, region.piece, false}, dst));
+}
+
+int BufferIO::writeprefix(const char* src) {
+    quo::CallFrame frame{"BufferIO::writeprefix", kSource};
+    quo::RasterRegion region;
+    if (!File->is_open() || File->state_ == 0 || !prefixRegion(region)) return finish(frame, QUO_REFUSED);
+    if (const int status = File->prepareRegion(quo::line_after(*File, FirstLine, Lines)))
+        return finish(frame, status);
+    return finish(frame,
+                  quo::write_region(*File->stream_, region, {nullptr, 0, region.piece, region.piece, false}, src));
+}
+
+int BufferIO::readbuffer(char* dst, int width) {
+    quo::CallFrame frame{"BufferIO::readbuffer", kSource};
+    if (!converts(MemoryType) || !converts(File->CellType)) return finish(frame, QUO_REFUSED);
+    if (const int status = openForReading()) return frame.callee(status);
+    const auto region = quo::region_of_samples(*File, FirstLine, Lines, FirstSample, Samples);
+    if (File->state_ == 1 || !region || width < Samples) return finish(frame, QUO_REFUSED);
+    if (const int status = File->prepareRegion(quo::line_after(*File, FirstLine, Lines)))
+        return finish(frame, status);
+
+    const auto kernel = quo::find_kernel(quo::SampleAccess::kRegionRead, File->CellType, MemoryType);
+    if (!kernel) return frame.success();  // deliberate: a pair without a conversion is no failure
+    const auto size = static_cast<std::int64_t>(quo::sample_size(MemoryType));
+    return finish(frame,
+                  quo::read_region(*File->stream_, *region,
+                                   {kernel, Samples, Samples * size, width * size, File->ByteOrder == 1}, dst));
+}
+
+int BufferIO::writebuffer(const char* src, int width) {
+    quo::CallFrame frame{"BufferIO::writebuffer", kSource};
+    const auto kernel = quo::find_kernel(quo::SampleAccess::kRegionWrite, File->CellType, MemoryType);
+    const auto region = quo::region_of_samples(*File, FirstLine, Lines, FirstSample, Samples);
+    if (!File->is_open() || File->state_ == 0 || !kernel || !region || width < Samples) {
+        return finish(frame, QUO_REFUSED);
+    }
+    if (const int status = File->prepareRegion(quo::line_after(*File, FirstLine, Lines)))
+        return finish(frame, status);
+    const auto size = static_cast<std::int64_t>(quo::sample_size(MemoryType));
+    return finish(frame,
+                  quo::write_region(*File->stream_, *region,
+                                    {kernel, Samples, Samples * size, width * size, File->ByteOrder == 1}, src));
+}

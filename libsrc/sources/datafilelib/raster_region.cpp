@@ -1,0 +1,205 @@
+#include "datafilelib/raster_region.h"
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cstdio>
+#include <cstring>
+#include <string>
+
+#include "diagnosticslib/call_frame.h"
+#include "sarutillib/checked_size.h"
+
+namespace quo {
+namespace {
+
+// Large enough to make system calls rare, small enough to stay in the second-level cache while it is converted.
+constexpr std::int64_t kChunk = std::int64_t{1} << 20;
+// Pieces nearer to each other than this are read in one transfer with what lies between.
+constexpr std::int64_t kSmallGap = 4096;
+
+using Offset = Checked<std::int64_t>;
+
+std::optional<RasterRegion> checked_region(Offset first, Offset distance, Offset piece, std::int64_t count) {
+    const Offset end = first + distance * std::max<std::int64_t>(count - 1, 0) + piece;
+    if (!first.value() || !distance.value() || !piece.value() || !end.value()) return std::nullopt;
+    return RasterRegion{*first.value(), *distance.value(), *piece.value(), count};
+}
+
+Offset line_distance(const RasterDescription& raster) {
+    return Offset{raster.NrOfPixelsPerLine} * raster.element_sizeof() + raster.RowPrefix;
+}
+
+bool describes_lines(const RasterDescription& raster) {
+    return raster.element_sizeof() > 0 && raster.NrOfPixelsPerLine >= 0 && raster.RowPrefix >= 0 &&
+           raster.HeaderOffset >= 0;
+}
+
+/** Moves a region chunk by chunk. */
+class RegionReader {
+public:
+    RegionReader(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout, char* to)
+        : stream_{stream}, region_{region}, layout_{layout}, to_{to} {}
+
+    int run() {
+        const bool grows = layout_.memory_piece >= region_.piece;
+        const bool packed = layout_.memory_row == layout_.memory_piece;
+        if (region_.distance == region_.piece && packed && grows) return read_in_place();
+        return read_through_scratch();
+    }
+
+private:
+    // Pieces without gaps on either side: each chunk goes into the upper end of its own room and is converted
+    // there.
+    int read_in_place() {
+        const std::int64_t at_once =
+            std::max<std::int64_t>(1, kChunk / std::max<std::int64_t>(layout_.memory_piece, 1));
+        for (std::int64_t done = 0; done < region_.count; done += at_once) {
+            const std::int64_t pieces = std::min(at_once, region_.count - done);
+            const auto bytes = static_cast<std::size_t>(pieces * region_.piece);
+            char* room = to_ + done * layout_.memory_piece;
+            char* upper = room + pieces * (layout_.memory_piece - region_.piece);
+            if (stream_.read_at(region_.first + done * region_.distance, upper, bytes) != bytes)
+                return QUO_READ_FAILED;
+            if (layout_.kernel) {
+                layout_.kernel(upper, room, static_cast<std::size_t>(pieces * layout_.samples), layout_.swap);
+            }
+        }
+        return QUO_OK;
+    }
+
+    int read_through_scratch() {
+        const bool together = region_.distance - region_.piece <= kSmallGap;
+        const std::int64_t at_once =
+            together ? std::max<std::int64_t>(1, kChunk / std::max<std::int64_t>(region_.distance, 1)) : 1;
+        const std::int64_t longest = span(std::min(at_once, region_.count));
+        TrackedBuffer<char> scratch{static_cast<std::size_t>(longest)};
+        if (!scratch) return QUO_NO_MEMORY;
+        for (std::int64_t done = 0; done < region_.count; done += at_once) {
+            const std::int64_t pieces = std::min(at_once, region_.count - done);
+            const auto bytes = static_cast<std::size_t>(span(pieces));
+            if (stream_.read_at(region_.first + done * region_.distance, scratch.data(), bytes) != bytes) {
+                return QUO_READ_FAILED;
+            }
+            for (std::int64_t i = 0; i < pieces; ++i) {
+                store(scratch.data() + i * region_.distance, to_ + (done + i) * layout_.memory_row);
+            }
+        }
+        return QUO_OK;
+    }
+
+    [[nodiscard]] std::int64_t span(std::int64_t pieces) const {
+        return (pieces - 1) * region_.distance + region_.piece;
+    }
+    void store(const char* from, char* to) const {
+        if (layout_.kernel) {
+            layout_.kernel(from, to, static_cast<std::size_t>(layout_.samples), layout_.swap);
+        } else {
+            std::memcpy(to, from, static_cast<std::size_t>(region_.piece));
+        }
+    }
+
+    const RasterStream& stream_;
+    const RasterRegion& region_;
+    const RegionLayout& layout_;
+    char* to_;
+};
+
+int copy_bytes(const RasterStream& from, const RasterStream& to) {
+    const auto length = from.length();
+    if (!length) return QUO_READ_FAILED;
+    TrackedBuffer<char> chunk{static_cast<std::size_t>(kChunk)};
+    if (!chunk) return QUO_NO_MEMORY;
+    for (std::int64_t done = 0; done < *length; done += kChunk) {
+        const auto bytes = static_cast<std::size_t>(std::min(kChunk, *length - done));
+        if (from.read_at(done, chunk.data(), bytes) != bytes) return QUO_READ_FAILED;
+        if (to.write_at(done, chunk.data(), bytes) != bytes) return QUO_WRITE_FAILED;
+    }
+    return QUO_OK;
+}
+
+bool same_file(const char* a, const char* b) {
+    struct stat first {
+    }, second{};
+    return stat(a, &first) == 0 && stat(b, &second) == 0 && first.st_dev == second.st_dev &&
+           first.st_ino == second.st_ino;
+}
+
+}  // namespace
+
+std::optional<RasterRegion> region_of_samples(const RasterDescription& raster, std::int64_t first_line,
+                                              std::int64_t lines, std::int64_t first_sample,
+                                              std::int64_t samples) {
+    if (!describes_lines(raster) || first_line < 0 || lines < 0 || first_sample < 0 || samples < 0 ||
+        first_sample + samples > raster.NrOfPixelsPerLine) {
+        return std::nullopt;
+    }
+    const Offset distance = line_distance(raster);
+    const Offset first = Offset{raster.HeaderOffset} + distance * first_line + raster.RowPrefix +
+                         Offset{first_sample} * raster.element_sizeof();
+    return checked_region(first, distance, Offset{samples} * raster.element_sizeof(), lines);
+}
+
+std::optional<RasterRegion> region_of_prefixes(const RasterDescription& raster, std::int64_t first_line,
+                                               std::int64_t lines) {
+    if (!describes_lines(raster) || first_line < 0 || lines < 0) return std::nullopt;
+    const Offset distance = line_distance(raster);
+    return checked_region(Offset{raster.HeaderOffset} + distance * first_line, distance, raster.RowPrefix, lines);
+}
+
+std::int64_t line_after(const RasterDescription& raster, std::int64_t first_line, std::int64_t lines) {
+    const Offset place = Offset{raster.HeaderOffset} + line_distance(raster) * (Offset{first_line} + lines);
+    return place.value().value_or(raster.HeaderOffset);
+}
+
+int read_region(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout, char* to) {
+    if (region.count == 0 || region.piece == 0) return QUO_OK;
+    const auto length = stream.length();
+    if (!length || region.end() > *length) return QUO_READ_FAILED;
+    return RegionReader{stream, region, layout, to}.run();
+}
+
+int write_region(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout,
+                 const char* from) {
+    if (region.count == 0 || region.piece == 0) return QUO_OK;
+    const bool gapless = region.distance == region.piece;
+    const std::int64_t at_once = gapless ? std::max<std::int64_t>(1, kChunk / region.piece) : 1;
+    TrackedBuffer<char> scratch{static_cast<std::size_t>(std::min(at_once, region.count) * region.piece)};
+    if (!scratch) return QUO_NO_MEMORY;
+    for (std::int64_t done = 0; done < region.count; done += at_once) {
+        const std::int64_t pieces = std::min(at_once, region.count - done);
+        for (std::int64_t i = 0; i < pieces; ++i) {
+            const char* row = from + (done + i) * layout.memory_row;
+            char* room = scratch.data() + i * region.piece;
+            if (layout.kernel) {
+                layout.kernel(row, room, static_cast<std::size_t>(layout.samples), layout.swap);
+            } else {
+                std::memcpy(room, row, static_cast<std::size_t>(region.piece));
+            }
+        }
+        const auto bytes = static_cast<std::size_t>(pieces * region.piece);
+        if (stream.write_at(region.first + done * region.distance, scratch.data(), bytes) != bytes) {
+            return QUO_WRITE_FAILED;
+        }
+    }
+    return QUO_OK;
+}
+
+int copy_raster(const char* from, const char* to, bool overwrite) {
+    if (same_file(from, to) || (!overwrite && access(to, F_OK) == 0)) return QUO_REFUSED;
+    errno = 0;
+    RasterStream source, target;
+    if (!source.open(from, RasterStream::Mode::kRead)) return QUO_NOT_OPENED;
+    // Under another name until it is whole, so that an old raster survives a failure.
+    const std::string unfinished = std::string{to} + ".part";
+    if (!target.open(unfinished.c_str(), RasterStream::Mode::kCreate)) return QUO_NOT_OPENED;
+    int status = copy_bytes(source, target);
+    const bool closed = target.close();
+    if (status == QUO_OK && (!closed || std::rename(unfinished.c_str(), to) != 0)) status = QUO_WRITE_FAILED;
+    if (status != QUO_OK) unlink(unfinished.c_str());
+    return status;
+}
+
+}  // namespace quo

@@ -1,0 +1,112 @@
+#include "datafilelib/raster_stream.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+
+namespace quo {
+namespace {
+
+// The kernel moves at most 0x7ffff000 bytes at once.
+constexpr std::size_t kMostAtOnce = std::size_t{1} << 30;
+
+int flags_of(RasterStream::Mode mode) {
+    switch (mode) {
+        case RasterStream::Mode::kRead:
+            return O_RDONLY;
+        case RasterStream::Mode::kCreate:
+            return O_WRONLY | O_CREAT | O_TRUNC;
+        case RasterStream::Mode::kCreateAndRead:
+            return O_RDWR | O_CREAT | O_TRUNC;
+        case RasterStream::Mode::kUpdate:
+            return O_RDWR;
+    }
+    return O_RDONLY;
+}
+
+// Repeats `step(done, left)` until everything is moved or a step moves nothing.
+template <typename Step>
+std::size_t move_all(std::size_t size, Step step) {
+    std::size_t done = 0;
+    while (done < size) {
+        const ssize_t moved = step(done, std::min(size - done, kMostAtOnce));
+        if (moved < 0 && errno == EINTR) {
+            errno = 0;
+            continue;
+        }
+        if (moved <= 0) break;
+        done += static_cast<std::size_t>(moved);
+    }
+    return done;
+}
+
+}  // namespace
+
+bool RasterStream::open(const char* path, Mode mode) noexcept {
+    close();
+    const int descriptor = ::open(path, flags_of(mode) | O_CLOEXEC, 0666);
+    if (descriptor < 0) return false;
+    struct stat status {};
+    if (fstat(descriptor, &status) != 0 || S_ISDIR(status.st_mode)) {
+        ::close(descriptor);
+        errno = EISDIR;
+        return false;
+    }
+    descriptor_ = descriptor;
+    place_ = 0;
+    return true;
+}
+
+bool RasterStream::close() noexcept {
+    if (descriptor_ < 0) return true;
+    const bool closed = ::close(descriptor_) == 0;
+    descriptor_ = -1;
+    place_ = 0;
+    return closed;
+}
+
+std::optional<std::int64_t> RasterStream::length() const noexcept {
+    struct stat status {};
+    if (descriptor_ < 0 || fstat(descriptor_, &status) != 0) return std::nullopt;
+    return status.st_size;
+}
+
+std::size_t RasterStream::read_at(std::int64_t offset, void* to, std::size_t size) const noexcept {
+    if (descriptor_ < 0 || offset < 0) return 0;
+    return move_all(size, [&](std::size_t done, std::size_t left) {
+        return pread(descriptor_, static_cast<char*>(to) + done, left, offset + static_cast<std::int64_t>(done));
+    });
+}
+
+std::size_t RasterStream::write_at(std::int64_t offset, const void* from, std::size_t size) const noexcept {
+    if (descriptor_ < 0 || offset < 0) return 0;
+    return move_all(size, [&](std::size_t done, std::size_t left) {
+        return pwrite(descriptor_, static_cast<const char*>(from) + done, left,
+                      offset + static_cast<std::int64_t>(done));
+    });
+}
+
+std::size_t RasterStream::read(void* to, std::size_t size) noexcept {
+    const std::size_t moved = read_at(place_, to, size);
+    place_ += static_cast<std::int64_t>(moved);
+    return moved;
+}
+
+std::size_t RasterStream::write(const void* from, std::size_t size) noexcept {
+    const std::size_t moved = write_at(place_, from, size);
+    place_ += static_cast<std::int64_t>(moved);
+    return moved;
+}
+
+bool raster_exists(const char* path) noexcept {
+    RasterStream stream;
+    const int kept = errno;
+    const bool exists = stream.open(path, RasterStream::Mode::kRead);
+    errno = kept;
+    return exists;
+}
+
+}  // namespace quo

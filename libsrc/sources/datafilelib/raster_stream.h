@@ -1,0 +1,49 @@
+#ifndef QUO_RASTER_STREAM_H
+#define QUO_RASTER_STREAM_H
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+
+namespace quo {
+
+/** An open raster file: whole transfers at 64-bit positions, and a place of its own for those that follow each
+ * other. Folders are refused. */
+class RasterStream {
+public:
+    enum class Mode : std::uint8_t { kRead, kCreate, kCreateAndRead, kUpdate };
+
+    RasterStream() noexcept = default;
+    ~RasterStream() { close(); }
+    RasterStream(const RasterStream&) = delete;
+    RasterStream& operator=(const RasterStream&) = delete;
+
+    [[nodiscard]] bool open(const char* path, Mode mode) noexcept;
+    /** False when what was written could not be handed to the disk. */
+    bool close() noexcept;
+    [[nodiscard]] bool is_open() const noexcept { return descriptor_ >= 0; }
+    /** Bytes in the file, or nothing when they cannot be told. */
+    [[nodiscard]] std::optional<std::int64_t> length() const noexcept;
+
+    /** Bytes moved: fewer than asked for at the end of the file or when the system refuses. */
+    std::size_t read_at(std::int64_t offset, void* to, std::size_t size) const noexcept;
+    std::size_t write_at(std::int64_t offset, const void* from, std::size_t size) const noexcept;
+
+    /** @name Transfers from place to place
+     * @{ */
+    std::size_t read(void* to, std::size_t size) noexcept;
+    std::size_t write(const void* from, std::size_t size) noexcept;
+    void seek(std::int64_t offset) noexcept { place_ = offset; }
+    /** @} */
+
+private:
+    int descriptor_ = -1;
+    std::int64_t place_ = 0;
+};
+
+/** Whether a raster can be opened for reading. */
+[[nodiscard]] bool raster_exists(const char* path) noexcept;
+
+}  // namespace quo
+
+#endif

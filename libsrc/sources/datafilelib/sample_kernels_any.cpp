@@ -1,0 +1,7 @@
+#include <cstdint>
+
+#include "datafilelib/kernel_table.h"
+
+namespace quo::kernels_any {
+#include "datafilelib/sample_kernels.inc"
+}  // namespace quo::kernels_any

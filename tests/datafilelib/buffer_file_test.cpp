@@ -1,0 +1,315 @@
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <climits>
+#include <cstdint>
+#include <optional>
+#include <random>
+#include <string>
+#include <vector>
+
+#include "quo_base/datafile.h"
+#include "support/diagnostics.h"
+#include "support/raster.h"
+
+namespace {
+
+/** A plain file in memory. */
+struct PlainFile {
+    std::string bytes;
+    int64_t place = 0;
+
+    std::string read(int n) {
+        if (place >= static_cast<int64_t>(bytes.size())) return "";
+        const std::string piece = bytes.substr(static_cast<std::size_t>(place), static_cast<std::size_t>(n));
+        place += static_cast<int64_t>(piece.size());
+        return piece;
+    }
+    void write(const std::string& piece) {
+        if (piece.empty()) return;
+        const std::size_t end = static_cast<std::size_t>(place) + piece.size();
+        if (bytes.size() < end) bytes.resize(end, '\0');
+        bytes.replace(static_cast<std::size_t>(place), piece.size(), piece);
+        place += static_cast<int64_t>(piece.size());
+    }
+    void seek(int64_t offset, int type) {
+        if (offset == 0) return;
+        const int64_t base = type == 1 ? place : type == 2 ? static_cast<int64_t>(bytes.size()) : 0;
+        if (base + offset >= 0) place = base + offset;
+    }
+};
+
+struct Walk {
+    int mode, size, keep;
+};
+std::vector<Walk> walks() {
+    std::vector<Walk> all;
+    for (const int mode : {1, 2, 3}) {
+        for (const int size : {0, 1, 2, 3, 7, 16, 33, 400}) {
+            for (const int keep : {0, 1, 5, 100}) {
+                if (mode == 1 || keep == 0) all.push_back({mode, size, keep});
+            }
+        }
+    }
+    return all;
+}
+class RandomWalk : public testing::TestWithParam<Walk> {};
+
+// Long sequences of requests against a plain file: what is read, what is written, where it goes on, and in the end
+// the bytes on the disk.
+TEST_P(RandomWalk, SeesWhatAPlainFileGives) {
+    const Walk& walk = GetParam();
+    const test::TemporaryFolder folder;
+    const std::string name = folder.file("walk.raw");
+    std::mt19937 generator{static_cast<unsigned>(walk.mode * 1000 + walk.size * 10 + walk.keep)};
+    const auto random = [&](int low, int high) {
+        return std::uniform_int_distribution<int>{low, high}(generator);
+    };
+    for (int round = 0; round < 12; ++round) {
+        PlainFile plain;
+        for (int i = 0; i < 211; ++i) plain.bytes += static_cast<char>(random(1, 255));
+        test::write_text(name, plain.bytes);
+        BufferFile file{name.c_str()};
+        file.open(walk.mode);
+        ASSERT_TRUE(file.is_open());
+        if (walk.mode == 2) plain.bytes.clear();
+        file.initbuffer(walk.size, walk.keep);
+        EXPECT_EQ(file.is_buffered(), walk.size > 0);
+        for (int step = 0; step < 400; ++step) {
+            const int n = random(0, 9) == 0 ? random(0, 150) : random(0, 12);
+            const int what = random(0, 9);
+            if (what < 4) {
+                std::string got(static_cast<std::size_t>(n), '?');
+                const int moved = file.read(got.data(), n);
+                got.resize(static_cast<std::size_t>(moved));
+                ASSERT_EQ(got, walk.mode == 2 ? "" : plain.read(n)) << "round " << round << " step " << step;
+            } else if (what < 7) {
+                std::string piece;
+                for (int i = 0; i < n; ++i) piece += static_cast<char>(random(1, 255));
+                const int moved = file.write(piece.data(), n);
+                ASSERT_EQ(moved, walk.mode == 1 ? 0 : n);
+                if (walk.mode != 1) plain.write(piece);
+            } else {
+                const int type = random(0, 2);
+                const int64_t offset = type == 0 ? random(0, 260) : type == 1 ? random(-40, 40) : random(-200, 20);
+                file.seek(offset, type);
+                plain.seek(offset, type);
+            }
+            if (walk.mode != 3 || walk.size == 0) {
+                ASSERT_EQ(file.tell(), plain.place) << "round " << round << " step " << step;
+            }
+        }
+        file.close();
+        ASSERT_TRUE(test::read_text(name) == plain.bytes) << "round " << round;
+    }
+    EXPECT_EQ(errno, 0);
+}
+INSTANTIATE_TEST_SUITE_P(Buffers, RandomWalk, testing::ValuesIn(walks()), [](const auto& row) {
+    return "Mode" + std::to_string(row.param.mode) + "Size" + std::to_string(row.param.size) + "Keep" +
+           std::to_string(row.param.keep);
+});
+
+class BufferFileBytes : public testing::Test {
+protected:
+    BufferFileBytes() {
+        for (int i = 0; i < 100; ++i) content_ += static_cast<char>(i);
+        test::write_text(name_, content_);
+    }
+    test::TemporaryFolder folder_;
+    std::string name_ = folder_.file("bytes.raw"), content_;
+    BufferFile file_{name_.c_str()};
+};
+
+TEST_F(BufferFileBytes, TellsWhereTheBufferStandsAsDescribed) {
+    file_.open(3);
+    file_.initbuffer(20, 5);
+    char bytes[30];
+    ASSERT_EQ(file_.read(bytes, 8), 8);
+    EXPECT_EQ(file_.tell(), 0) << "reading and writing: the buffer's start";
+    file_.seek(70, 0);
+    EXPECT_EQ(file_.tell(), 60) << "half a buffer before the target";
+    file_.close();
+    EXPECT_FALSE(file_.is_buffered());
+    EXPECT_EQ(file_.tell(), 0);
+
+    file_.open(1);
+    file_.initbuffer(20, 5);
+    file_.seek(70, 0);
+    EXPECT_EQ(file_.tell(), 70);
+    file_.seek(0, 0);
+    file_.seek(0, 1);
+    file_.seek(0, 2);
+    EXPECT_EQ(file_.tell(), 70) << "an offset of 0 changes nothing";
+    file_.seek(1000, 5);
+    EXPECT_EQ(file_.tell(), 70) << "nor does an unknown type";
+}
+
+TEST_F(BufferFileBytes, IgnoresWhatItCannotDo) {
+    char bytes[10] = {};
+    EXPECT_EQ(file_.read(bytes, 4), 0);
+    EXPECT_EQ(file_.write(bytes, 4), 0);
+    file_.open(7);
+    EXPECT_FALSE(file_.is_open());
+    file_.open(1);
+    EXPECT_EQ(file_.write(bytes, 4), 0);
+    EXPECT_EQ(file_.read(bytes, -4), 0);
+    file_.initbuffer(0, 0);
+    file_.initbuffer(-5, 0);
+    EXPECT_FALSE(file_.is_buffered());
+    file_.setFilename(folder_.path().c_str());
+    file_.open(1);
+    EXPECT_FALSE(file_.is_open()) << "a folder";
+    EXPECT_FALSE(file_.exists());
+    EXPECT_EQ(errno, 0);
+    EXPECT_EQ(test::read_text(name_), content_);
+}
+
+TEST_F(BufferFileBytes, AFullDiskMovesLess) {
+    BufferFile full{"/dev/full"};
+    full.open(3);
+    const char bytes[100] = {};
+    EXPECT_EQ(full.write(bytes, 100), 0);
+    full.initbuffer(16, 0);
+    EXPECT_LT(full.write(bytes, 100), 100);
+    full.close();
+    EXPECT_EQ(errno, 0);
+}
+
+TEST_F(BufferFileBytes, ReadsSingleSamplesOfItsOwnTypeOnly) {
+    struct Row {
+        int type, order;
+    };
+    file_.NrOfLinesPerImage = 2;
+    file_.NrOfPixelsPerLine = 3;
+    file_.RowPrefix = 1;
+    for (const int buffer : {0, 5, 200}) {
+        for (int type = 0; type <= 9; ++type) {
+            for (const int order : {0, 1}) {
+                file_.CellType = type;
+                file_.ByteOrder = order;
+                file_.HeaderOffset = 0;
+                test::write_text(name_, test::raster_bytes(file_));
+                file_.open(1);
+                file_.initbuffer(buffer, 0);
+                const double part = test::part_value(1, 2, 0), imaginary = test::part_value(1, 2, 1);
+                const auto expect = [&](int wanted, double value) {
+                    return type == wanted && order == 0 ? value : 0.0;
+                };
+                EXPECT_EQ(static_cast<double>(file_.readFloat(1, 2)), expect(FLOAT32, part));
+                EXPECT_EQ(file_.readDouble(1, 2), expect(FLOAT64, part));
+                EXPECT_EQ(static_cast<double>(file_.readInt(1, 2)), expect(INT32, part));
+                EXPECT_EQ(static_cast<double>(file_.readShort(1, 2)), expect(INT16, part));
+                EXPECT_EQ(static_cast<double>(file_.readFloatComplex(1, 2).imag()),
+                          expect(FLOAT_COMPLEX, imaginary));
+                EXPECT_EQ(file_.readDoubleComplex(1, 2).imag(), expect(DOUBLE_COMPLEX, imaginary));
+                EXPECT_EQ(file_.readInt(2, 0), 0) << "beyond the file";
+                EXPECT_EQ(file_.readInt(-1, 0), 0);
+                EXPECT_EQ(file_.readInt(0, 3), 0);
+                file_.close();
+            }
+        }
+    }
+    // The very first sample: its offset is 0, which seek() would ignore.
+    file_.CellType = INT16;
+    file_.ByteOrder = file_.RowPrefix = 0;
+    test::write_text(name_, test::raster_bytes(file_));
+    file_.open(1);
+    file_.initbuffer(4, 1);
+    EXPECT_EQ(file_.readShort(1, 1), static_cast<short>(test::part_value(1, 1, 0)));
+    EXPECT_EQ(file_.readShort(0, 0), static_cast<short>(test::part_value(0, 0, 0)));
+}
+
+TEST_F(BufferFileBytes, BlocksAndBytesSeeTheSameFile) {
+    file_.NrOfLinesPerImage = 6;
+    file_.NrOfPixelsPerLine = 5;
+    file_.RowPrefix = 2;
+    file_.HeaderOffset = 4;
+    file_.CellType = INT16;
+    std::string expected = test::raster_bytes(file_);
+    test::write_text(name_, expected);
+    file_.open(3);
+    file_.initbuffer(16, 0);
+    ASSERT_EQ(file_.write("ab", 2), 2);  // pending in the buffer while blocks move
+    expected.replace(0, 2, "ab");
+    const short values[] = {1001, 1002, 1003, 1004};
+    file_.writebuffer(values, 2, 2, 1, 2);
+    for (int i = 0; i < 4; ++i) {
+        std::string part;
+        test::append_bytes(part, values[i], false);
+        expected.replace(static_cast<std::size_t>(4 + (2 + i / 2) * 12 + 2 + (1 + i % 2) * 2), 2, part);
+    }
+    char prefixes[4];
+    file_.readprefix(prefixes, 1, 2);
+    EXPECT_EQ(std::string(prefixes, 2), expected.substr(4 + 12, 2));
+    file_.writeprefix("PQRS", 3, 2);
+    expected.replace(4 + 36, 2, "PQ").replace(4 + 48, 2, "RS");
+    file_.writeOffset("HEADER", 6);
+    expected.replace(0, 4, "HEAD");
+    short back[4];
+    file_.readbuffer(back, 2, 2, 1, 2);
+    EXPECT_TRUE(std::equal(back, back + 4, values));
+    EXPECT_EQ(file_.write("z", 1), 1) << "after a block the next line follows";
+    expected.replace(4 + 48, 1, "z");
+    file_.close();
+    EXPECT_EQ(test::read_text(name_), expected);
+}
+
+struct BadBlock {
+    int line, lines, sample, samples;
+};
+TEST_F(BufferFileBytes, BlocksOutsideTheRasterAreIgnored) {
+    file_.NrOfLinesPerImage = 5;
+    file_.NrOfPixelsPerLine = 10;
+    file_.CellType = INT16;
+    const BadBlock rows[] = {{-1, 1, 0, 0}, {0, -1, 0, 0}, {0, 1, -1, 5},           {0, 1, 6, 5},
+                             {0, 1, 0, -3}, {4, 2, 0, 0},  {INT_MAX, INT_MAX, 0, 0}};
+    file_.open(1);
+    for (const BadBlock& row : rows) {
+        short untouched = 77;
+        file_.readbuffer(&untouched, row.line, row.lines, row.sample, row.samples);
+        EXPECT_EQ(untouched, 77) << row.line;
+    }
+    file_.NrOfPixelsPerLine = INT_MAX;
+    short untouched = 77;
+    file_.readbuffer(&untouched, 0, 1, 0, 0);
+    EXPECT_EQ(untouched, 77);
+}
+
+TEST_F(BufferFileBytes, HeaderNamesTheRaster) {
+    file_.NrOfLinesPerImage = 6;
+    file_.NrOfPixelsPerLine = 5;
+    file_.RowPrefix = 2;
+    file_.HeaderOffset = 4;
+    file_.CellType = INT_COMPLEX;
+    file_.ByteOrder = 1;
+    ASSERT_EQ(file_.writehdr(), 0);
+    BufferFile read;
+    EXPECT_EQ(read.getType(), 10);
+    ASSERT_EQ(read.readhdr((name_ + ".hdr").c_str()), 0);
+    char name[512];
+    read.getFilename(name);
+    EXPECT_EQ(name, name_);
+    EXPECT_EQ(read.getLines(), 6);
+    EXPECT_EQ(read.getSamples(), 5);
+    EXPECT_EQ(read.getRowPrefix(), 2);
+    EXPECT_EQ(read.getOffsetSize(), 4);
+    EXPECT_EQ(read.getType(), INT_COMPLEX);
+    EXPECT_EQ(read.getFileEndian(), 1);
+    EXPECT_EQ(read.pixelsizeof(), 8);
+    EXPECT_EQ(read.readhdr(), 0);
+    EXPECT_EQ(read.readhdr("x"), 1);
+    EXPECT_EQ(read.readhdr(folder_.file("missing.hdr").c_str()), 1);
+
+    BufferFile cloned;
+    EXPECT_EQ(cloned.clone(&file_), 0);
+    EXPECT_EQ(cloned.getType(), INT_COMPLEX);
+    EXPECT_FALSE(cloned.is_open());
+    const std::string other = folder_.file("copy.raw");
+    ASSERT_EQ(file_.copy(other.c_str()), 0);
+    EXPECT_EQ(test::read_text(other), content_);
+    EXPECT_EQ(cloned.readhdr((other + ".hdr").c_str()), 0);
+    EXPECT_EQ(file_.copy(other.c_str(), 0), 1);
+}
+
+}  // namespace
