@@ -13,7 +13,6 @@ namespace {
 
 using test::angle_deg;
 using test::CircularOrbit;
-using test::cross;
 using test::dot;
 using test::kEarthRate;
 using test::kLightSpeed;

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 #include <limits>
 #include <random>
@@ -186,7 +187,7 @@ TEST(GrPtSwept, EndsAtTheHeightAndAtTheHorizon) {
                 return ray_range(sat.position, std::cos(angle) * down + std::sin(angle) * across);
             };
             double shortest = kInfinity, inside = 0.5, outside = 1.5;
-            for (double angle = 0.0; angle < 0.02; angle += 1e-6) shortest = std::min(shortest, range_at(angle));
+            for (int i = 0; i < 20000; ++i) shortest = std::min(shortest, range_at(1e-6 * i));
             while (outside - inside > 1e-15) {
                 const double middle = 0.5 * (inside + outside);
                 (std::isnan(range_at(middle)) ? outside : inside) = middle;
