@@ -133,7 +133,8 @@ void sample_call(benchmark::State& state) {
 }
 void fit_call(benchmark::State& state) {
     std::array<double, 15> positions{};
-    for (std::size_t i = 0; i < 15; ++i) positions[i] = (&scene().states[Scene::kColumns * (i / 3)].position.x)[i % 3];
+    for (std::size_t i = 0; i < 15; ++i)
+        positions[i] = (&scene().states[Scene::kColumns * (i / 3)].position.x)[i % 3];
     double x[5], y[5], z[5];
     for (auto _ : state)  // NOLINT(clang-analyzer-deadcode.DeadStores): the library's own loop
         benchmark::DoNotOptimize(orb_interp(0.0, kSpacing, positions.data(), nullptr, 5, x, y, z));
