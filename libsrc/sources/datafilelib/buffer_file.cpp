@@ -164,6 +164,11 @@ bool BufferFile::advanceForReading() {
 }
 
 int BufferFile::read(void* dst, int n) {
+    if (n > 0 && n <= fill_ - cursor_ && mode_ != WRITE) {  // the common case: all of it is there
+        std::memcpy(dst, buffer_.get() + cursor_, static_cast<std::size_t>(n));
+        cursor_ += n;
+        return n;
+    }
     const QuietErrno quiet;
     if (!is_open() || mode_ == WRITE || n < 1) return 0;
     auto* to = static_cast<char*>(dst);

@@ -1,0 +1,1 @@
+quo_bench(raster SOURCES raster_bench.cpp COMPONENTS datafile)
