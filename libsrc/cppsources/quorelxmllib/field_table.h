@@ -73,12 +73,13 @@ struct Field {
     bool mandatory = true;
     InProfile in_profile = InProfile::kMandatory;
     std::size_t room = 0;
+    const char *unit = "", *meaning = "";
 
     void* (*address)(Owner&) = nullptr;  // first value; null while an array is not allocated
     std::int32_t fixed_count = 0;        // 0: the length is a member
     std::int32_t (*length)(const Owner&) = nullptr;
     void (*set_length)(Owner&, std::int32_t) = nullptr;
-    std::int32_t per_length = 1;  // values per unit of length
+    std::int32_t per_length = 0;  // values per unit of length; 0: no length is known
     bool (*allocate)(Owner&, std::size_t) = nullptr;
     void (*release)(Owner&) = nullptr;
 
@@ -102,6 +103,12 @@ struct Bounds {
 };
 /** The values that make sense; not enforced on reading. */
 constexpr Bounds bounds(double minimum, double maximum) { return {minimum, maximum}; }
+
+struct Note {
+    const char *unit, *meaning;
+};
+/** What the value is, for generated documentation. */
+constexpr Note note(const char* unit, const char* meaning) { return {unit, meaning}; }
 
 struct Element {
     const char* name;
@@ -138,6 +145,11 @@ template <typename Owner>
 constexpr void apply(Field<Owner>& field, Bounds rule) {
     field.minimum = rule.minimum;
     field.maximum = rule.maximum;
+}
+template <typename Owner>
+constexpr void apply(Field<Owner>& field, Note rule) {
+    field.unit = rule.unit;
+    field.meaning = rule.meaning;
 }
 template <typename Owner>
 constexpr void apply(Field<Owner>& field, Element rule) {
@@ -270,7 +282,7 @@ public:
     constexpr FieldTable(const char* section, Fields... fields) : section_{section}, fields_{fields...} {
         for (const Field<Owner>& field : fields_) {
             if (std::string_view{field.name}.size() >= sizeof(parElement::name)) throw "element name too long";
-            if (field.is_array_of_any_length() && !field.length) throw "array without QUO_LENGTH";
+            if (field.is_array_of_any_length() && field.per_length < 1) throw "array without QUO_LENGTH";
         }
     }
 
