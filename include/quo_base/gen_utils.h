@@ -22,10 +22,10 @@ QUO_BASE_C_BEGIN
  * standard error stream where the function's comment says so. Nothing is kept between calls: all of it is
  * reentrant. */
 
-/* ---- Byte order
- * -------------------------------------------------------------------------------------------------- Any order
- * other than 'l' and 'm' prints "\norder must be 'm' or 'l'!\n" on the standard output and ENDS THE PROCESS with
- * exit status 1, in every reader and writer below. */
+/* Byte order.
+ *
+ * Any order other than 'l' and 'm' prints "\norder must be 'm' or 'l'!\n" on the standard output and ENDS THE
+ * PROCESS with exit status 1, in every reader and writer below. */
 
 /** Byte-order code of the host: 'l' on every supported one. */
 QUO_BASE_API char endi(void) QUO_NOEXCEPT;
@@ -67,9 +67,7 @@ QUO_BASE_API void swp_any(void* buffer, int64_t length_in_bytes, int element_siz
  * elements are swapped, each as one number of 16 bytes. */
 QUO_BASE_API int get_endian(void* buffer, int64_t count, int element_size, int swap) QUO_NOEXCEPT;
 
-/* ---- Number classes
- * ---------------------------------------------------------------------------------------------- All answer 1 or 0
- * from the bit pattern alone. */
+/* Number classes: 1 or 0 from the bit pattern alone. */
 
 /** Double: only the high 32-bit word is looked at. Deliberate: a not-a-number whose fraction bits all lie in the
  * low word counts as infinite and not as not-a-number. */
@@ -82,8 +80,7 @@ QUO_BASE_API int myisinf4(float x) QUO_NOEXCEPT;
 QUO_BASE_API int myisnan4(float x) QUO_NOEXCEPT;
 QUO_BASE_API int myfinite4(float x) QUO_NOEXCEPT;
 
-/* ---- Time
- * -------------------------------------------------------------------------------------------------------- */
+/* Time. */
 
 /** Time of satellite product files: 12 bytes, each field most significant byte first on every host. */
 typedef struct MjdRecord {
@@ -127,7 +124,7 @@ QUO_BASE_API void sec852mjd(double t, MjdRecord* record_out) QUO_NOEXCEPT;
  *
  * @param[out] text_out  28 bytes: the text and its terminating zero; unchanged unless 0 is returned
  * @return 0; or -1 with "Date should be later than 1-JAN-1985\n" on the standard error stream for a negative time,
- * and with "Date should be earlier than 1-JAN-10000\n" for one beyond four-digit years or not-a-number. */
+ *         and with "Date should be earlier than 1-JAN-10000\n" for one beyond four-digit years or not-a-number. */
 QUO_BASE_API int sec852myascii(double t, char* text_out) QUO_NOEXCEPT;
 
 /** sec85 or MJD record to the long date text, without the terminating zero: exactly 27 characters are written.
@@ -156,8 +153,7 @@ QUO_BASE_API double ascii2sec85(const char* text) QUO_NOEXCEPT;
  * known: any other counts as month 13. Missing trailing fields are 0. */
 QUO_BASE_API double utc_ch2num(const char* text) QUO_NOEXCEPT;
 
-/* ---- Texts, files and paths
- * -------------------------------------------------------------------------------------- */
+/* Texts, files and paths. */
 
 /** Compares two texts with A-Z folded to lower case, whatever the locale. 0 when they are equal or the same
  * pointer, else the difference of the first two folded characters (as unsigned bytes) that differ. A null pointer
@@ -166,9 +162,9 @@ QUO_BASE_API int mystrcasecmp(const char* a, const char* b) QUO_NOEXCEPT;
 
 /** Moves a stream to a 64-bit offset from the start (whence 0), its present position (1) or its end (2).
  *
- * @return 0; what was written is then flushed, the underlying descriptor stands at the new place, the stream reads
- * and writes there, and its end-of-file flag is cleared. -1 for any other whence, an offset that overflows or lies
- *         before the start, or a failed flush or seek; whence 2 may then have moved the stream to its end. */
+ * @return 0: what was written is flushed, the underlying descriptor stands at the new place, the stream reads and
+ *         writes there, and its end-of-file flag is cleared. -1: no stream, another whence, an offset that overflows
+ *         or lies before the start, or a failed flush or seek; whence 2 may then have moved the stream to its end. */
 QUO_BASE_API int myfseek64_msc(FILE* stream, int64_t offset64, int whence) QUO_NOEXCEPT;
 
 /** Removes one final slash or backslash in place. Returns the length before that. */

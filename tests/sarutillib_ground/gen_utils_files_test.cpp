@@ -83,6 +83,7 @@ TEST_F(Seek, FlushesWhatWasWrittenAndWritesAtTheNewPlace) {
 
 TEST_F(Seek, RefusesWhatLeadsNowhere) {
     myfseek64_msc(stream_.get(), 2, 0);
+    EXPECT_EQ(myfseek64_msc(nullptr, 0, 0), -1);
     EXPECT_EQ(myfseek64_msc(stream_.get(), 0, 3), -1);
     EXPECT_EQ(myfseek64_msc(stream_.get(), 0, -1), -1);
     EXPECT_EQ(myfseek64_msc(stream_.get(), -1, 0), -1);

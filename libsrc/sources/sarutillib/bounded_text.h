@@ -18,7 +18,9 @@ std::size_t copy_bounded(char (&to)[Room], std::string_view text) noexcept {
     return copy_bounded(to, Room, text);
 }
 
-/** Formats into `to`, cut to room - 1 characters and always NUL-terminated. Returns the characters written. */
+/** Formats into `to`, cut as above and always NUL-terminated; text that cannot be formatted gives an empty one.
+ * Returns the characters written; errno stays. Numbers with a decimal point are better made by number_text.h: here
+ * they would follow the locale. */
 std::size_t format_bounded(char* to, std::size_t room, const char* format, ...) noexcept QUO_PRINTF_LIKE(3, 4);
 
 /** Text of a NUL-terminated string, empty for a null pointer. */

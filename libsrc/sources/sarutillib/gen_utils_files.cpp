@@ -13,6 +13,7 @@ namespace {
 
 /** Offset that `whence` counts from, or nothing. */
 std::optional<std::int64_t> seek_base(std::FILE* stream, int whence) noexcept {
+    if (!stream) return std::nullopt;
     if (whence == 0) return 0;
     if (whence != 1 && whence != 2) return std::nullopt;
     if (whence == 2 && ::fseeko(stream, 0, SEEK_END) != 0) return std::nullopt;
