@@ -162,9 +162,10 @@ QUO_BASE_API int mystrcasecmp(const char* a, const char* b) QUO_NOEXCEPT;
 
 /** Moves a stream to a 64-bit offset from the start (whence 0), its present position (1) or its end (2).
  *
- * @return 0: what was written is flushed, the underlying descriptor stands at the new place, the stream reads and
- *         writes there, and its end-of-file flag is cleared. -1: no stream, another whence, an offset that overflows
- *         or lies before the start, or a failed flush or seek; whence 2 may then have moved the stream to its end. */
+ * @return 0: what was written is flushed, the underlying descriptor stands at the new place, the stream reads
+ *         and writes there, and its end-of-file flag is cleared. -1: no stream, another whence, an offset that
+ *         overflows or lies before the start, or a failed flush or seek (whence 2 may then have moved the stream
+ *         to its end). */
 QUO_BASE_API int myfseek64_msc(FILE* stream, int64_t offset64, int whence) QUO_NOEXCEPT;
 
 /** Removes one final slash or backslash in place. Returns the length before that. */
