@@ -25,6 +25,9 @@ TEST(NameHash, TellsWhereOneNameEndsAndTheNextBegins) {
     const std::set<std::uint64_t> hashes{hash({"ab", "c"}), hash({"a", "bc"}), hash({"abc"}), hash({"abc", ""}),
                                          hash({"", "abc"}), hash({"c", "ab"}), hash({""}),    hash({})};
     EXPECT_EQ(hashes.size(), 8U);
+    // The end of a name, written backwards and with what marks its length, must not pass for the middle of
+    // another.
+    EXPECT_NE(hash({"abcdef", "x"}), hash({"fedcba\x01x"}));
     EXPECT_EQ(hash({"ab", "c"}), hash({std::string{"ab"}, std::string{"c"}}));
 }
 

@@ -57,6 +57,7 @@ const IntList kIntLists[] = {
     {"BlankBeforeTheOpeningBrace", " {7}", 1, 10, {}},
     {"SecondOpeningBrace", "{{7}", 1, 10, {}},
     {"TabsAndRunsOfBlanks", "{1\t \t2   3}", 3, 0, {1, 2, 3}},
+    {"TabsAlone", "{1\t2\t}", 2, 0, {1, 2}},
     {"Signs", "-17 +29", 2, 0, {-17, 29}},
     {"SignAlone", "17 - 3", 2, 10, {17}},
     {"RestOfAWordIsIgnored", "12abc 3,4 5.9", 3, 0, {12, 3, 5}},

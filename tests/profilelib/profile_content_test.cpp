@@ -120,11 +120,13 @@ TEST(ProfileContent, DeletingASectionUncoversTheEarlierOne) {
 }
 
 // A value may be set to itself, or to a part of itself: it must be copied before the old one goes.
-TEST(ProfileContent, SetsAKeyToAPartOfItsOwnValue) {
+TEST(ProfileContent, SetsAKeyToItsOwnValue) {
     ProfileContent content;
     content.set("s", "k", "a text that is too long to be stored within a string object");
-    content.set("s", "k", content.find("s", "k") + 7);
-    EXPECT_STREQ(content.find("s", "k"), "that is too long to be stored within a string object");
+    EXPECT_STREQ(content.set("s", "k", content.find("s", "k")),
+                 "a text that is too long to be stored within a string object");
+    EXPECT_STREQ(content.set("s", "k", content.find("s", "k") + 7),
+                 "that is too long to be stored within a string object");
 }
 
 /** Every name that stands in the model, and one that does not, must be answered alike. */
