@@ -31,7 +31,7 @@ std::string leak_lines() {
 }
 
 class Calls : public testing::Test {
-protected:
+public:
     Calls() {
         exit_ckerr();
         init_ckerr_locking();
@@ -42,6 +42,8 @@ protected:
         exit_ckerr();
         for (void* block : blocks_) free_ckerr(block);
     }
+
+protected:
     /** A block that shows in the leak report which function is running. */
     void mark() { blocks_.push_back(malloc_ckerr(1)); }
 

@@ -34,7 +34,7 @@ constexpr char kLaunchDate[] = "Thu Apr  3 21:02:26 2014\n";
 constexpr std::time_t kLaunch_s = 1396558946;
 
 class ReportFile : public testing::Test {
-protected:
+public:
     ReportFile() {
         setenv("TZ", "UTC0", 1);
         tzset();
@@ -51,6 +51,7 @@ protected:
         exit_ckerr();
     }
 
+protected:
     /** The report's text without its opening banner. */
     [[nodiscard]] std::string body() const {
         const std::string text = test::read_text(name);

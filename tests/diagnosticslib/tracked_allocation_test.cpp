@@ -22,7 +22,6 @@ extern "C" [[gnu::visibility("default")]] const char* __asan_default_options() {
 namespace {
 
 using testing::HasSubstr;
-using testing::StartsWith;
 
 constexpr int kCapacity = 16384;
 /** More than any address space gives, without overflowing. Volatile: compilers warn of such a request. */
@@ -36,7 +35,7 @@ std::string leak_report() {
 }
 
 class Tracked : public testing::Test {
-protected:
+public:
     Tracked() {
         exit_ckerr();
         init_ckerr_locking();
@@ -300,8 +299,8 @@ TEST_F(Tracked, FullTableFailsTheAllocationWithAnErrorEntry) {
 
 TEST_F(Tracked, FullTableIsNoLimitWithoutTracking) {
     exit_ckerr();
-    std::vector<void*> blocks;
-    for (int i = 0; i < kCapacity + 10; ++i) blocks.push_back(malloc_ckerr(1));
+    std::vector<void*> blocks(kCapacity + 10);
+    for (void*& block : blocks) block = malloc_ckerr(1);
     EXPECT_EQ(std::count(blocks.begin(), blocks.end(), nullptr), 0);
     for (void* block : blocks) free_ckerr(block);
 }

@@ -70,12 +70,8 @@ void release_block(void* block) noexcept {
 }
 
 using SystemAllocator = void*(std::size_t bytes);
-void* plain_memory(std::size_t bytes) noexcept {
-    return std::malloc(bytes);
-}
-void* zeroed_memory(std::size_t bytes) noexcept {
-    return std::calloc(1, bytes);
-}
+void* plain_memory(std::size_t bytes) noexcept { return std::malloc(bytes); }
+void* zeroed_memory(std::size_t bytes) noexcept { return std::calloc(1, bytes); }
 
 void* allocate(std::size_t count, std::size_t size, SystemAllocator* system, const char* function,
                int line) noexcept {
@@ -125,13 +121,9 @@ extern "C" int set_ckerr_fun(const char* name) noexcept {
     return 1;
 }
 
-extern "C" void deccurdep(void) noexcept {
-    call_stack.pop();
-}
+extern "C" void deccurdep(void) noexcept { call_stack.pop(); }
 
-extern "C" int ckflg_ckerr(void) noexcept {
-    return call_stack.tracking ? 1 : 0;
-}
+extern "C" int ckflg_ckerr(void) noexcept { return call_stack.tracking ? 1 : 0; }
 
 extern "C" void* malloc_ckerr(size_t size) noexcept {
     return allocate(1, size, plain_memory, "malloc_ckerr", __LINE__);
@@ -155,7 +147,8 @@ extern "C" void freeall_ckerr(void) noexcept {
 
 extern "C" void* matalloc_ckerr(int rows, size_t row_bytes) noexcept {
     const std::size_t count = rows > 0 ? static_cast<std::size_t>(rows) : 0;
-    auto** const array = static_cast<void**>(malloc_ckerr(count * sizeof(void*)));
+    auto** const array =
+        static_cast<void**>(allocate(count, sizeof(void*), plain_memory, "matalloc_ckerr", __LINE__));
     if (!array) return nullptr;
     for (int row = 0; row < rows; ++row) {
         array[row] = calloc_ckerr(1, row_bytes);
