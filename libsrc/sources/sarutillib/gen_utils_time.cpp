@@ -136,8 +136,7 @@ void sec852mjd(double t, MjdRecord* record_out) noexcept {
     double seconds = 0.0;
     if (days >= Days::min() && days <= Days::max()) {
         whole_days = static_cast<std::int32_t>(days);
-        // The quotient may have been rounded up to the next day.
-        seconds = std::max(0.0, since_2000 - days * kSecondsPerDay);
+        seconds = since_2000 - days * kSecondsPerDay;
     }
     const auto whole_seconds = static_cast<std::uint32_t>(seconds);
     put_field(record_out->days, static_cast<std::uint32_t>(whole_days));
