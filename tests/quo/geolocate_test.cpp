@@ -88,6 +88,9 @@ TEST(Geolocate, ReturnsToTheSampleItCameFrom) {
                                    test::text_of(c.range_s) + "," + test::text_of(c.time_s) + "\n");
         ASSERT_EQ(forth.exit_status, 0) << forth.err;
         const Csv ground{forth.out};
+        const Vec3 by_angles =
+            test::geodetic_point(ground.number(0, "latitude_deg"), ground.number(0, "longitude_deg"));
+        EXPECT_LT(norm(ground.vector(0, "x_m", "y_m", "z_m") - by_angles), 1e-6);
         const auto back =
             quo({"geolocate", scene_file(c.scene), "--to", "radar"},
                 "latitude_deg,longitude_deg,height_m,doppler_hz\n" + ground.text(0, "latitude_deg") + "," +
@@ -235,8 +238,9 @@ INSTANTIATE_TEST_SUITE_P(Geolocate, RowWithoutSolution, testing::ValuesIn(kBadRo
                          [](const auto& row) { return row.param.name; });
 
 TEST(Geolocate, MarksPointsThatAreNotSeen) {
-    const auto run = quo({"geolocate", scene_file(kCoast), "--to", "radar"},
-                         "latitude_deg,longitude_deg,height_m\n91,11,0\n41,361,0\n-41,11,0\n41.1,11.9,0\n");
+    const auto run =
+        quo({"geolocate", scene_file(kCoast), "--to", "radar"},
+            "latitude_deg,longitude_deg,height_m\n91,11,0\n41,361,0\n-41,11,0\n41.1,11.9,0\n-41.1,-168.1,0\n");
     EXPECT_EQ(run.exit_status, 1);
     const Csv times{run.out};
     EXPECT_EQ(times.text(0, "status"), "1");
@@ -244,6 +248,7 @@ TEST(Geolocate, MarksPointsThatAreNotSeen) {
     EXPECT_EQ(times.text(2, "status"), "12");
     EXPECT_EQ(times.text(2, "azimuth_time_s"), "");
     EXPECT_EQ(times.text(3, "status"), "0");
+    EXPECT_EQ(times.text(4, "status"), "12");  // the antipode of the one before, abeam but behind the Earth
     EXPECT_THAT(run.messages()[0], testing::HasSubstr("latitude_deg is \"91\", outside -90 to 90"));
 }
 

@@ -90,7 +90,7 @@ TEST(TiePoints, PointsThatAreNotSeenAreCounted) {
     const test::TemporaryFolder folder;
     test::write_text(folder.file("points.csv"),
                      "azimuth_time_s,range_time_s,latitude_deg,longitude_deg,height_m,incidence_deg\n"
-                     "1133090037.5,0.0053,-12.9,79.7,0,30\n");
+                     "1133090037.5,0.0053,63.7,79.7,0,30\n");
     const auto run = quo({"tiepoints", "--json", scene_file(kSea), "--points", folder.file("points.csv")});
     EXPECT_EQ(run.exit_status, 1);
     EXPECT_EQ(nlohmann::json::parse(run.out)[0].at("without_solution"), 1);

@@ -56,14 +56,19 @@ int to_ground(Scene& scene, const double* in, double doppler_hz, double* out) {
     return status;
 }
 
-int to_radar(Scene& scene, const double* in, double doppler_hz, double* out) {
-    const Vector point = position({in[0], in[1], in[2]});
-    return scene.orbit().earth2sat(point.v, out, out + 1, doppler_hz);
-}
+using Inverse = int (GeneralSAROrbit::*)(const double*, double*, double*, double) noexcept;
 
-int to_radar_precisely(Scene& scene, const double* in, double doppler_hz, double* out) {
-    const Vector point = position({in[0], in[1], in[2]});
-    return scene.orbit().earth2satPrecise(point.v, out, out + 1, doppler_hz);
+// The equations of range and Doppler know nothing of the Earth in between: a point near the antipode solves them
+// too.
+template <Inverse solve>
+int to_radar(Scene& scene, const double* in, double doppler_hz, double* out) {
+    const Geodetic ground{in[0], in[1], in[2]};
+    const Vector point = position(ground);
+    Vector platform{};
+    int status = (scene.orbit().*solve)(point.v, out, out + 1, doppler_hz);
+    if (status == 0) status = scene.orbit().SVGetPos(out[0], platform.v);
+    if (status == 0 && angle_deg(platform - point, normal(ground)) > 90.0) return QUO_NOT_SEEN;
+    return status;
 }
 
 constexpr Input kSample[] = {{"azimuth_time_s"}, {"range_time_s"}};
@@ -73,8 +78,8 @@ constexpr const char* kGeometry[] = {"x_m",           "y_m",      "z_m",        
 constexpr const char* kTimes[] = {"azimuth_time_s", "range_time_s"};
 
 constexpr Direction kToGround{kSample, kGeometry, to_ground};
-constexpr Direction kToRadar{kPoint, kTimes, to_radar};
-constexpr Direction kToRadarPrecisely{kPoint, kTimes, to_radar_precisely};
+constexpr Direction kToRadar{kPoint, kTimes, to_radar<&GeneralSAROrbit::earth2sat>};
+constexpr Direction kToRadarPrecisely{kPoint, kTimes, to_radar<&GeneralSAROrbit::earth2satPrecise>};
 
 const Direction& direction_of(const GeolocateOptions& options) {
     if (options.direction == "ground") {

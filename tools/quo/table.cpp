@@ -14,16 +14,11 @@ std::string_view trimmed(std::string_view text) {
     return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
 }
 
-/** A field without its quotes, doubled quotes inside made single. */
-std::string unquoted(std::string_view field) {
+/** A field without the quotes around it. Quotes inside stay as they are: no column that is looked for has any. */
+std::string_view unquoted(std::string_view field) {
     field = trimmed(field);
-    if (field.size() < 2 || field.front() != '"' || field.back() != '"') return std::string{field};
-    std::string text;
-    for (std::size_t i = 1; i + 1 < field.size(); ++i) {
-        text += field[i];
-        if (field[i] == '"') ++i;
-    }
-    return text;
+    const bool quoted = field.size() >= 2 && field.front() == '"' && field.back() == '"';
+    return quoted ? field.substr(1, field.size() - 2) : field;
 }
 
 /** Length of the quoted field at the start of `text`, quotes included; npos where the quote is left open. */
@@ -63,7 +58,7 @@ Table::Table(const std::string& name) : input_{name} {
     }
     if (line_.empty() || line_.front() == '#') throw Failure(input_.name() + ": no line of column names");
     if (!split_fields(line_, fields_)) throw Failure(place() + ": a quote is not closed");
-    for (const std::string_view field : fields_) columns_.push_back(unquoted(field));
+    for (const std::string_view field : fields_) columns_.emplace_back(unquoted(field));
 }
 
 std::optional<std::size_t> Table::find(std::string_view column) const {
