@@ -65,6 +65,13 @@ public:
      *         kMaxChirpSamples, or the bandwidth is such that phase or amplitude have no finite value. A bandwidth
      * of 0 gives samples of 0. */
     int generateChirp(fcomplex* chirp) const;
+    /** Writes the reference chirp as a raster of one line of FLOAT_COMPLEX samples, little-endian, and its side
+     * file
+     * "<file>.hdr".
+     *
+     * @return 0; 1 where generateChirp() would refuse, or for a name of 512 bytes or more, with nothing written;
+     * 5, 7, 9; 1 where only the side file could not be written. Every failure has an entry. */
+    int writeChirp(const char* file) const;
 
     double PulseLength = -999.0;        ///< s
     double Bandwidth = -999.0;          ///< Hz
@@ -83,6 +90,16 @@ public:
     int readhdr(const char* file) override;   ///< XML section, else the same file as a parameter file; 0 or 1
     int writehdr(const char* file) override;  ///< replaces the section in the file; 0 or 1
     int clone(SensorAttitude_Obj* to) const;  ///< copies every member; 0
+
+    /** Loads DroopGain and Temperature of one swath from an annex file.
+     *
+     * The file has a main header of 1247 and a specific header of 378 bytes; the decimal number that starts 231
+     * bytes into the latter is the offset of the data set, of 171648 bytes. From its byte 171232 on it has 68
+     * bytes per swath: the temperature as a float and the gains as doubles, all big-endian.
+     * @param swath  0 to 4; deliberate: any other leaves both members as they are, with 0
+     * @return 0; 1 for an offset that is no number or negative; 4 for a file that is too short; 7; 9. Members
+     * change with 0 only. */
+    int getDroopGain(const char* annex_file, int swath);
 
     double Eq_speed = -999.0;       ///< equivalent speed, m/s
     double Eq_distance = -999.0;    ///< equivalent distance, m

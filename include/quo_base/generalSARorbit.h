@@ -29,6 +29,16 @@ class OrbitModel;
 struct OrbitSample;
 }  // namespace quo
 
+class GSRoi_Obj;
+class ROI_Obj;
+class geoCoords_Obj;
+class polyDC;
+class polyFR;
+class polyGR2SL;
+class polySL2GR;
+class polySL2PHI;
+class polySL2THETA;
+
 /** State vectors of a product header, with one polynomial through all of them. Section "StateVectorData". */
 class QUO_BASE_API SAROrbitStateVectors_Obj : public GeneralSAR_Base {
 public:
@@ -62,7 +72,7 @@ public:
      * first, m and m/s. Null before SVPolyCompute(). */
     const double* positionPoly(int axis) const noexcept;
     const double* velocityPoly(int axis) const noexcept;
-    /** Copies vectors and polynomials into `other`. 0; 1 for null; 7. */
+    /** Copies vectors, polynomials and look direction into `other`. 0; 1 for null; 7. */
     int clone(SAROrbitStateVectors_Obj* other) noexcept;
 
     double* pSV_m = nullptr;    ///< nSV_n x 3 positions, m; owned
@@ -70,6 +80,8 @@ public:
     double t0SV_s = -999.0;     ///< time of the first vector, s
     double dtSV_s = -999.0;     ///< spacing, s
     std::int32_t nSV_n = -999;  ///< number of vectors
+    /** Look sign of the product, negative looks left; not part of the section. GeneralSAR::GSread() sets it. */
+    std::int32_t LookDirection = 0;
 
 protected:
     void refreshParameters() override;
@@ -227,7 +239,9 @@ public:
     int earth2satLinear(const double xyz[3], double* t, double* rangeTime) noexcept;
     int earth2satLinear(const double xyz[3], double* t, double* rangeTime, double doppler) noexcept;
     /** Time and range time at which the point is seen: first guess, then Newton's method on the run of five there,
-     * to 1e-8 s. Where that leaves the run, the search goes on from the other first guess over the whole orbit.
+     * to 1e-8 s. Where that leaves the run, the search goes on from the other first guess over the whole orbit,
+     * and last from the state vector nearest to the point. On an orbit so long that straight flight is no guess (a
+     * sixth of a revolution) that vector comes first, so that the nearest pass is found.
      * @return 0; 1 without a model, with both outputs -1.0; 12. */
     int earth2sat(const double xyz[3], double* t, double* rangeTime) noexcept;
     int earth2sat(const double xyz[3], double* t, double* rangeTime, double doppler) noexcept;
@@ -269,6 +283,62 @@ public:
     int SVGetSatSpeed(double t, double range, double* speed) noexcept;
     double SVGetSatSpeed(double t, double range, double doppler) noexcept;
     double SVGetSatSpeed(double t, double range) noexcept;
+
+    /** Fills the points of a product's geographic description from the corners and the middle of its region,
+     * Doppler 0, height 0; its grid spacing stays.
+     *
+     * With P1 = (first line, near range), P2 = (first line, far range), P3 = (last line, near range) and P4 =
+     * (last line, far range), the start plus the length being the last, NorthWest, NorthEast, SouthWest and
+     * SouthEast receive P3, P4, P1 and P2 on an ascending orbit, else P2, P1, P4 and P3: right for a platform that
+     * looks to the right. The points are made in the order P1 to P4, Center; a failure leaves those before it
+     * filled.
+     * @return 0; 1 for null; or the status of SVGetLatLon() or SVGetAngles() */
+    int SVGetGeoCoords(geoCoords_Obj* grid, const GSRoi_Obj* roi) noexcept;
+
+    // --- polynomials derived from the orbit
+    // ---------------------------------------------------------------------- Least-squares fits of the geometry
+    // over a region's fast and slow start and length. `dc` tells the Doppler of every sample. 1 for a region or
+    // Doppler that is null, 10 for a fit that does not give finite numbers, else the status of the sampled
+    // geometry, of polfit() or of lfitd(). An output that is null is skipped; all outputs are unchanged on
+    // failure.
+    //
+    // The forms in range alone sample the middle of the region's azimuth times: 10 range times from the start to
+    // start + length (50 in _v2), a parabola through them in c0, c1 and c4, the others 0, taz0 = 0. Its value is
+    // the same at any azimuth time. trg0 is the region's fast start (dc's trg0 in _v2). Where the region has no
+    // extent in range, polfit() leaves the mean as a constant polynomial, with 0.
+    //
+    // The forms in both times sample 100 range times by 50 azimuth times, both ends included, and fit all seven
+    // coefficients; trg0 is the region's fast start, taz0 its slow start. 10 where a length is 0.
+    //
+    // How far the parabolas and the forms in both times stay from the geometry at zero Doppler, anywhere in the
+    // region, at the middle azimuth time for parabolas:
+    //
+    //  platform height, slant range length          FM rate       angles            ground range   slant range
+    //  700 km, 53 km at 31 degrees incidence        @FR1
+    //  700 km, 157 km at 31 to 46 degrees           @FR2
+    //  12.5 km, 1.6 km at 21 to 34 degrees          @FR3
+
+    /** Azimuth FM rate, Hz/s. */
+    int SVGetFRpoly(const ROI_Obj* roi, const polyDC* dc, polyFR* fr) noexcept;
+    /** The same from 50 samples around dc's trg0. A trg0 that lies seconds away from the region, such as -999,
+     * costs digits: the value is then good to 4e-16 |c4| trg0^2. */
+    int SVGetFRpoly_v2(const ROI_Obj* roi, const polyDC* dc, polyFR* fr) noexcept;
+    /** Incidence and look angle, degrees, in range alone. */
+    int SVGetSlantToAnglesPolys(const ROI_Obj* roi, const polyDC* dc, polySL2THETA* theta,
+                                polySL2PHI* phi) noexcept;
+    /** Incidence and look angle, degrees, in both times. */
+    int SVGetTimeToAnglesPolys(const ROI_Obj* roi, const polyDC* dc, polySL2THETA* theta,
+                               polySL2PHI* phi) noexcept;
+    /** Ground range, m, from the point at trg0 on, and back, in range alone. The ground range is the sum of the
+     * chords between neighbouring samples.
+     *
+     * gr2sl takes the ground range in place of the range time after trg0: EvaluatePoly(trg0 + ground range, any
+     * azimuth time) is the range time after trg0, s. */
+    int SVGetGroundToSlantPolys(const ROI_Obj* roi, const polyDC* dc, polySL2GR* sl2gr,
+                                polyGR2SL* gr2sl) noexcept;
+    /** The same in both times, every azimuth time's ground range beginning at trg0. gr2sl reaches as far as the
+     * shortest of the azimuth times' ground ranges. */
+    int SVGetGroundToTimePolys(const ROI_Obj* roi, const polyDC* dc, polySL2GR* sl2gr, polyGR2SL* gr2sl) noexcept;
 
     /** Rotation into the along-track frame of velocity v, row by row, and the speed with the sign of v's x
      * component (positive for 0).

@@ -220,18 +220,6 @@ bool file_can_hold(const polySAR& set, const char* file) {
     return bytes && total.value() && *total.value() <= *bytes;
 }
 
-/** The session for a file: the one that is open already, else one of our own. */
-class JoinedSession {
-public:
-    explicit JoinedSession(const char* file) {
-        if (!quo::HeaderSession::find(file)) own_.emplace(file);
-    }
-    [[nodiscard]] int commit() { return own_ ? own_->commit() : QUO_OK; }
-
-private:
-    std::optional<quo::HeaderSession> own_;
-};
-
 }  // namespace
 
 poly::poly() { createElementsVector(plain::kTable.size()); }
@@ -372,7 +360,7 @@ QUO_POLY_OPERATIONS(SL2PHI, 5, nsl2phi)
 
 int polySAR::writehdr(const char* file) {
     quo::CallFrame frame{"polySAR::writehdr", kSource};
-    JoinedSession session{file};
+    quo::JoinedSession session{file};
     if (const int status = writeAuxiliaryFile(file, 1, kSetSection)) return frame.callee(status);
     const int status = each_list(*this, [file](const Quantity& quantity, auto& list, std::int32_t count) {
         for (int i = 0; i < count; ++i) {
@@ -387,7 +375,7 @@ int polySAR::writehdr(const char* file) {
 
 int polySAR::readhdr(const char* file) {
     quo::CallFrame frame{"polySAR::readhdr", kSource};
-    const JoinedSession session{file};
+    const quo::JoinedSession session{file};
     DestroyPolys();
     if (!readAuxiliaryFile(file, 1, kSetSection) && counts::kTable.read_profile(*this, file) != QUO_OK) {
         DestroyPolys();

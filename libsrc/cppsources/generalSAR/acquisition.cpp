@@ -8,6 +8,9 @@
 #include <string>
 
 #include "diagnosticslib/call_frame.h"
+#include "generalSAR/annex_file.h"
+#include "quo_base/datafile.h"
+#include "quo_base/gen_utils.h"
 #include "quo_base/profile.h"
 #include "quorelxmllib/field_table.h"
 #include "roilib/rounding.h"
@@ -53,6 +56,10 @@ constexpr quo::FieldTable kTable{
     "SensorAttitude",       QUO_FIELD(Eq_speed),      QUO_FIELD(Eq_distance), QUO_FIELD(Mean_DC),
     QUO_FIELD(SquintAngle), QUO_FIELD(AntennaLength), QUO_FIELD(DroopGain),   QUO_FIELD(Temperature),
 };
+
+// The data set of an annex file ends with one record per swath: a temperature and the gains.
+constexpr int kAnnexSwaths = 5;
+constexpr std::size_t kAnnexData = 171648, kAnnexFirst = 171232, kAnnexRecord = 68;
 }  // namespace attitude
 
 namespace windows {
@@ -161,6 +168,27 @@ int SARPulse_Obj::generateChirp(fcomplex* samples) const {
     return frame.success();
 }
 
+int SARPulse_Obj::writeChirp(const char* file) const {
+    quo::CallFrame frame{"SARPulse_Obj::writeChirp", kSource};
+    const int n = chirpSamples();
+    quo::TrackedBuffer<fcomplex> chirp{static_cast<std::size_t>(std::max(n, 1))};
+    if (!chirp) return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
+    if (const int status = generateChirp(chirp.data())) return frame.callee(status);
+
+    DataFile raster;
+    if (const int status = raster.setFilename(file)) return frame.callee(status);
+    raster.NrOfPixelsPerLine = n;
+    raster.NrOfLinesPerImage = 1;
+    raster.CellType = FLOAT_COMPLEX;
+    if (const int status = raster.open(1)) return frame.callee(status);
+    BufferIO line{&raster, 0, n, 0, 1, FLOAT_COMPLEX};
+    if (const int status = line.writebuffer(reinterpret_cast<const char*>(chirp.data()), n))
+        return frame.callee(status);
+    if (const int status = raster.close()) return frame.callee(status);
+    if (const int status = raster.write_hdr()) return frame.callee(status);
+    return frame.success();
+}
+
 SensorAttitude_Obj::SensorAttitude_Obj() { createElementsVector(attitude::kTable.size()); }
 void SensorAttitude_Obj::refreshParameters() { attitude::kTable.register_all(*this); }
 int SensorAttitude_Obj::clone(SensorAttitude_Obj* to) const { return attitude::kTable.copy(*this, *to); }
@@ -170,6 +198,25 @@ int SensorAttitude_Obj::writehdr(const char* file) {
 int SensorAttitude_Obj::readhdr(const char* file) {
     return readAuxiliaryFile(file, 1, attitude::kTable.section()) ? QUO_OK
                                                                   : attitude::kTable.read_profile(*this, file);
+}
+
+int SensorAttitude_Obj::getDroopGain(const char* annex_file, int swath) {
+    quo::CallFrame frame{"SensorAttitude_Obj::getDroopGain", kSource};
+    quo::TrackedBuffer<char> data{attitude::kAnnexData};
+    if (!data) return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
+    if (const int status = quo::read_annex_data(annex_file, data.data(), data.size())) return frame.callee(status);
+    // Deliberate: a swath that the file does not have is no failure.
+    if (swath < 0 || swath >= attitude::kAnnexSwaths) return frame.success();
+
+    const char* record =
+        data.data() + attitude::kAnnexFirst + attitude::kAnnexRecord * static_cast<std::size_t>(swath);
+    Temperature = static_cast<double>(ch2float4(record, 'm'));
+    record += sizeof(float);
+    for (double& gain : DroopGain) {
+        gain = ch2double8(record, 'm');
+        record += sizeof(double);
+    }
+    return frame.success();
 }
 
 SpectralWindows_Obj::SpectralWindows_Obj() { createElementsVector(windows::kTable.size()); }

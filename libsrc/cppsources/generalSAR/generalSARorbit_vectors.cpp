@@ -125,6 +125,7 @@ int Obj::clone(SAROrbitStateVectors_Obj* other) noexcept {
     if (!other) return frame.fail(QUO_REFUSED, kBadArgument);
     if (other == this) return frame.success();
     if (const int status = kTable.copy(*this, *other)) return frame.callee(status);
+    other->LookDirection = LookDirection;
     other->fitted_ = fitted_ && other->vectors_ == vectors_;
     if (other->fitted_)
         std::copy_n(polynomials_.get(), 6 * static_cast<std::size_t>(vectors_), other->polynomials_.get());

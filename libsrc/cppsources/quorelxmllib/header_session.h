@@ -2,6 +2,7 @@
 #define QUO_HEADER_SESSION_H
 
 #include <memory>
+#include <optional>
 #include <string>
 
 #include "quo_base/api.h"
@@ -44,6 +45,20 @@ private:
     std::shared_ptr<HeaderDocument> document_;
     int failed_ = QUO_OK;
     bool changed_ = false;
+};
+
+/** The session for a file: the one that is open already, else one of its own. For objects of several sections,
+ * which are read and written by themselves or with a whole product. */
+class JoinedSession {
+public:
+    explicit JoinedSession(const char* file) {
+        if (!HeaderSession::find(file)) own_.emplace(file);
+    }
+    /** Saves what was written, unless that is left to the session that was open already. */
+    [[nodiscard]] int commit() { return own_ ? own_->commit() : QUO_OK; }
+
+private:
+    std::optional<HeaderSession> own_;
 };
 
 }  // namespace quo

@@ -1,0 +1,106 @@
+#ifndef QUO_BASE_GENERALSAR_H
+#define QUO_BASE_GENERALSAR_H
+
+#include <array>
+
+#include "quo_base/SARpolynomials.h"
+#include "quo_base/acquisition.h"
+#include "quo_base/api.h"
+#include "quo_base/datafile.h"
+#include "quo_base/dataset_info.h"
+#include "quo_base/generalSARorbit.h"
+#include "quo_base/geo_grid.h"
+#include "quo_base/quorelxml_v2.h"
+#include "quo_base/roi.h"
+#include "quo_base/swath.h"
+
+/** @file
+ * A whole product header: one object of each header class, read, written, copied and cleared together.
+ *
+ *     GeneralSAR product;
+ *     if (product.GSread("scene.hdr") == 0 && product.GSexists(gsOrbit)) product.orbit.SVGetLatLon(...);
+ */
+
+/** The objects of a product, in the order in which they are read. */
+enum GSObject : int {
+    gsDataFile = 0,           ///< GSDataFile_Obj
+    gsRoi = 1,                ///< GSRoi_Obj, section "ROI"
+    gsPolySAR = 2,            ///< polySAR, "PolySAR"
+    gsSamplingConstants = 3,  ///< SamplingConstants_Obj, "SamplingConstants"
+    gsStateVectors = 4,       ///< SAROrbitStateVectors_Obj, "StateVectorData"
+    gsOrbit = 5,              ///< GeneralSAROrbit, the same section
+    gsPulse = 6,              ///< SARPulse_Obj, "Pulse"
+    gsAntennaPattern = 7,     ///< AntennaPattern_Obj, "AntennaPattern"
+    gsDataSetInfo = 8,        ///< DataSetInfo_Obj, "DataSetInfo"
+    gsSensorAttitude = 9,     ///< SensorAttitude_Obj, "SensorAttitude"
+    gsSpectralWindows = 10,   ///< SpectralWindows_Obj, "SpectralWindows"
+    gsGeoCoords = 11,         ///< geoCoords_Obj, "GroundCornersPoints"
+    gsSwathInfo = 12,         ///< SwathInfo, "SwathInfo"
+    gsBufferFile = 13         ///< BufferFile, "RasterInfo"
+};
+
+/** The container of a product's header objects. Each has a presence flag, which says whether its content is valid;
+ * the object exists either way, with its defaults in a new container, and stays at its place as long as the
+ * container lives. One container serves one thread at a time. */
+class QUO_BASE_API GeneralSAR {
+public:
+    static constexpr int kObjects = 14;
+
+    /** Nothing present. */
+    GeneralSAR();
+    GeneralSAR(const GeneralSAR&) = delete;
+    GeneralSAR& operator=(const GeneralSAR&) = delete;
+
+    /** Reads a product header, an XML file or one of the older parameter files. What was there is released first
+     * (GSdestroy()); present are then the objects whose readhdr() succeeded. An XML header is parsed once. Where
+     * both are present, the orbit takes its wavelength from the sampling constants and, like the state vectors,
+     * its look direction from the data set.
+     * @return 0, whatever was found; 1 with the ERROR entry "File : %s DOES NOT EXIST!" where the file cannot be
+     *         opened, with nothing changed. */
+    int GSread(const char* file);
+    /** Writes the present objects, the last of GSObject first, each into its own section, which it replaces; other
+     * content of the file stays. An existing header is parsed once, and all sections are saved in one step, so
+     * that a failure leaves the file as it was. gsDataFile goes to the side file of the header's raster, which is
+     * the header itself where that ends in ".hdr". With nothing present no file is touched.
+     * @return 0. Deliberate: also where something could not be written; the report tells. */
+    int GSwrite(const char* file);
+
+    /** The object, present or not; the caller casts it to the class that GSObject tells. Null for another number.
+     */
+    GeneralSAR_Base* GSget(GSObject object) noexcept;
+    int GSenable(GSObject object) noexcept;         ///< sets the presence flag; 0, or 1 for another number
+    int GSdisable(GSObject object) noexcept;        ///< clears it; 0, or 1 for another number
+    bool GSexists(GSObject object) const noexcept;  ///< the presence flag; false for another number
+
+    /** Copies every present object into `other` and sets its flag there; what is absent here stays as it is there.
+     * @return 0; 1 for null; the status of the first copy that failed, which leaves that object's flag cleared and
+     *         stops no other. */
+    int GSclone(GeneralSAR* other);
+    /** Releases polynomials, state vectors (of both objects), and the arrays of swath and antenna pattern.
+     * Deliberate: the presence flags stay. Returns 0. */
+    int GSdestroy();
+
+    GSDataFile_Obj dataFile;
+    GSRoi_Obj roi;
+    polySAR polynomials;
+    SamplingConstants_Obj samplingConstants;
+    SAROrbitStateVectors_Obj stateVectors;
+    GeneralSAROrbit orbit;
+    SARPulse_Obj pulse;
+    AntennaPattern_Obj antennaPattern;
+    DataSetInfo_Obj dataSetInfo;
+    SensorAttitude_Obj sensorAttitude;
+    SpectralWindows_Obj spectralWindows;
+    geoCoords_Obj geoCoords;
+    SwathInfo swathInfo;
+    BufferFile bufferFile;
+
+private:
+    void linkObjects();
+    int cloneObject(int index, GeneralSAR& other);
+
+    const std::array<GeneralSAR_Base*, kObjects> objects_;
+    std::array<bool, kObjects> present_{};
+};
+
+#endif

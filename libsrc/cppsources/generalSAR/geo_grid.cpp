@@ -1,0 +1,80 @@
+#include "quo_base/geo_grid.h"
+
+#include <string>
+
+#include "diagnosticslib/call_frame.h"
+#include "generalSAR/raster_name.h"
+#include "quorelxmllib/field_table.h"
+#include "quorelxmllib/header_session.h"
+#include "sarutillib/bounded_text.h"
+
+namespace {
+
+constexpr const char* kSource = "generalSAR";
+constexpr const char* kProfileSection = "GeoGridSize";
+constexpr const char* kRoiSection = "ROI";
+
+using Obj = geoCoords_Obj;
+constexpr quo::FieldTable kTable{"GroundCornersPoints", QUO_FIELD(EastingGridSize), QUO_FIELD(NorthingGridSize)};
+
+struct NamedPoint {
+    const char* name;
+    geopoint Obj::*point;
+};
+constexpr NamedPoint kPoints[] = {{"NorthWest", &Obj::NorthWest},
+                                  {"NorthEast", &Obj::NorthEast},
+                                  {"SouthWest", &Obj::SouthWest},
+                                  {"SouthEast", &Obj::SouthEast},
+                                  {"Center", &Obj::Center}};
+
+}  // namespace
+
+Obj::geoCoords_Obj() { createElementsVector(kTable.size()); }
+void Obj::refreshParameters() { kTable.register_all(*this); }
+
+int Obj::clone(geoCoords_Obj* to) const {
+    for (const auto& [name, point] : kPoints) (this->*point).clone(&(to->*point));
+    return kTable.copy(*this, *to);
+}
+
+int Obj::writehdr(const char* file) {
+    quo::CallFrame frame{"geoCoords_Obj::writehdr", kSource};
+    quo::JoinedSession session{file};
+    if (const int status = writeAuxiliaryFile(file, 1, kTable.section())) return frame.callee(status);
+    for (const auto& [name, point] : kPoints)
+        if (const int status = (this->*point).writehdr(file, name)) return frame.callee(status);
+    if (const int status = session.commit()) return frame.callee(status);
+    return frame.success();
+}
+
+int Obj::readhdr(const char* file) {
+    quo::CallFrame frame{"geoCoords_Obj::readhdr", kSource};
+    const quo::JoinedSession session{file};
+    if (!readAuxiliaryFile(file, 1, kTable.section()))
+        if (const int status = kTable.read_profile(*this, file, kProfileSection)) return frame.silent(status);
+    for (const auto& [name, point] : kPoints)
+        if (const int status = (this->*point).readhdr(file, name)) return frame.callee(status);
+    return frame.success();
+}
+
+int GSRoi_Obj::readhdr(const char* file) { return Roi.read_roi(file, kRoiSection); }
+int GSRoi_Obj::writehdr(const char* file) { return Roi.write_roi(file, kRoiSection); }
+int GSRoi_Obj::clone(GSRoi_Obj* to) const { return Roi.clone(&to->Roi); }
+
+int GSDataFile_Obj::readhdr(const char* file) {
+    const auto raster = quo::raster_of_header(quo::text_or_empty(file));
+    if (raster) File.read_hdr(raster->c_str());
+    return QUO_OK;  // deliberate: a product always has this entry
+}
+
+int GSDataFile_Obj::writehdr(const char* file) {
+    const auto raster = quo::raster_of_header(quo::text_or_empty(file));
+    const std::string kept = File.FileName;
+    if (raster && File.setFilename(raster->c_str()) == QUO_OK) {
+        File.write_hdr();
+        File.setFilename(kept.c_str());
+    }
+    return QUO_OK;  // deliberate: the outcome stands in the report alone
+}
+
+int GSDataFile_Obj::clone(GSDataFile_Obj* to) const { return to->File.clone(&File); }

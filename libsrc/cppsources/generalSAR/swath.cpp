@@ -1,0 +1,149 @@
+#include "quo_base/swath.h"
+
+#include <cstring>
+#include <new>
+#include <optional>
+#include <string>
+
+#include "diagnosticslib/call_frame.h"
+#include "quo_base/gen_utils.h"
+#include "quo_base/profile.h"
+#include "quorelxmllib/field_table.h"
+#include "sarutillib/bounded_text.h"
+#include "sarutillib/checked_size.h"
+#include "sarutillib/file_io.h"
+
+namespace {
+
+constexpr const char* kSource = "generalSAR";
+constexpr const char* kNoMemory = "Memory allocation failure";
+constexpr const char* kChangesKey = "Swst_changes_bursts";
+
+using Obj = SwathInfo;
+constexpr quo::FieldTable kTable{
+    "SwathInfo",
+    QUO_FIELD(Rank),
+    QUO_FIELD(Rgate_bias),
+    QUO_FIELD(Echoes_per_burst),
+    QUO_FIELD(Lines_per_burst),
+    QUO_FIELD(Bursts),
+    QUO_FIELD(Order),
+    QUO_FIELD(Acquisition_Start_Time),
+    QUO_FIELD(Swst_changes),
+    QUO_FIELD(ProcessorGain),
+    QUO_FIELD(NoisePower),
+    QUO_FIELD(ChirpPower),
+};
+
+/** Where the bursts of a raster stand. */
+struct BurstLayout {
+    std::int64_t first, stride;  // bytes
+    std::int64_t bytes;          // up to the end of the last line header that is read
+};
+
+/** Nothing where the descriptions make no bursts. */
+std::optional<BurstLayout> layout_of(const SwathInfo& swath, const DataFile& raster) {
+    if (swath.Bursts < 0 || swath.Lines_per_burst < 1 || raster.NrOfPixelsPerLine < 0 || raster.HeaderOffset < 0 ||
+        raster.element_sizeof() == 0)
+        return std::nullopt;
+    using Bytes = quo::Checked<std::int64_t>;
+    const Bytes line = Bytes{raster.element_sizeof()} * raster.NrOfPixelsPerLine + SwathInfo::kLineHeader;
+    const Bytes stride = line * swath.Lines_per_burst;
+    const Bytes end = stride * std::max(swath.Bursts - 1, 0) + raster.HeaderOffset + SwathInfo::kLineHeader;
+    if (!stride.value() || !end.value()) return std::nullopt;
+    return BurstLayout{raster.HeaderOffset, *stride.value(), swath.Bursts > 0 ? *end.value() : 0};
+}
+
+/** Reads the start times of the bursts; the status of a file operation that failed. */
+int read_times(DataFile& raster, const BurstLayout& layout, std::vector<double>& times) {
+    std::int64_t place = layout.first;
+    for (double& time : times) {
+        char header[SwathInfo::kLineHeader];
+        if (const int status = raster.seek(place, 0)) return status;
+        if (const int status = raster.read(header, sizeof header)) return status;
+        MjdRecord record;
+        std::memcpy(&record, header, sizeof record);
+        time = mjd2sec85(record);
+        place += layout.stride;
+    }
+    return QUO_OK;
+}
+
+}  // namespace
+
+Obj::SwathInfo() { createElementsVector(kTable.size()); }
+void Obj::refreshParameters() { kTable.register_all(*this); }
+
+int Obj::createBuffers() {
+    quo::CallFrame frame{"SwathInfo::createBuffers", kSource};
+    quo::release_array(Swst_changes_bursts);
+    buffer_status_ = QUO_OK;
+    if (Swst_changes > kMaxSwstChanges) {
+        buffer_status_ = frame.fail(QUO_REFUSED, "More changes of the sampling window than are plausible");
+    } else if (Swst_changes > 0 &&
+               !quo::allocate_array(Swst_changes_bursts, static_cast<std::size_t>(Swst_changes))) {
+        buffer_status_ = frame.fail(QUO_NO_MEMORY, kNoMemory);
+    }
+    if (buffer_status_ != QUO_OK) {
+        destroyBuffers();
+        return buffer_status_;
+    }
+    refreshParameters();
+    return frame.success();
+}
+
+int Obj::destroyBuffers() {
+    quo::release_array(Swst_changes_bursts);
+    quo::release_array(BurstStartTimes);
+    Swst_changes = 0;
+    return QUO_OK;
+}
+
+int Obj::clone(SwathInfo* to) const {
+    quo::CallFrame frame{"SwathInfo::clone", kSource};
+    if (to == this) return frame.success();
+    try {
+        to->Swst_changes_bursts = Swst_changes_bursts;
+        to->BurstStartTimes = BurstStartTimes;
+    } catch (const std::bad_alloc&) {
+        return frame.fail(QUO_NO_MEMORY, kNoMemory);
+    }
+    if (const int status = kTable.copy(*this, *to)) return frame.callee(status);
+    return frame.success();
+}
+
+int Obj::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, kTable.section()); }
+
+int Obj::readhdr(const char* file) {
+    buffer_status_ = QUO_OK;
+    if (readAuxiliaryFile(file, 1, kTable.section())) return QUO_OK;
+    if (buffer_status_ == QUO_NO_MEMORY) return QUO_NO_MEMORY;
+    if (kTable.read_profile(*this, file) != QUO_OK) return QUO_REFUSED;
+    if (Swst_changes < 1) return createBuffers();
+    if (const int status = createBuffers()) return status;
+    if (GetMyProfileIntArray(kTable.section(), kChangesKey, Swst_changes_bursts.data(), Swst_changes, file) ==
+        QUO_OK)
+        return QUO_OK;
+    freeall_ckerr();
+    return QUO_REFUSED;
+}
+
+int Obj::readBurstTimes(const char* raster) {
+    quo::CallFrame frame{"SwathInfo::readBurstTimes", kSource};
+    // Without a name the side file would be some ".hdr" of the folder.
+    if (quo::text_or_empty(raster).empty()) return frame.fail(QUO_REFUSED, "No raster named");
+    if (const int status = readhdr((std::string{raster} + ".hdr").c_str())) return frame.callee(status);
+    DataFile file;
+    if (const int status = file.read_hdr(raster)) return frame.callee(status);
+    if (const int status = file.open(0)) return frame.callee(status);
+
+    const auto layout = layout_of(*this, file);
+    if (!layout) return frame.fail(QUO_REFUSED, "The description makes no bursts");
+    if (quo::file_length(raster).value_or(-1) < layout->bytes)
+        return frame.fail(QUO_READ_FAILED, "The raster is shorter than its bursts");
+    std::vector<double> times;
+    if (!quo::allocate_array(times, static_cast<std::size_t>(Bursts))) return frame.fail(QUO_NO_MEMORY, kNoMemory);
+    if (const int status = read_times(file, *layout, times)) return frame.callee(status);
+    BurstStartTimes.swap(times);
+    return frame.success();
+}
