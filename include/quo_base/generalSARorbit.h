@@ -144,8 +144,7 @@ public:
      */
     int clone(GeneralSAROrbit* other) noexcept;
 
-    // --- making an orbit
-    // -----------------------------------------------------------------------------------------
+    // --- making an orbit -------------------------------------------------------------------------
 
     /** Radar wavelength, m, > 0; 1 for anything else. */
     int setLambda(double lambda) noexcept;
@@ -180,8 +179,7 @@ public:
      * @return 0, whatever was found; 7. `findings` is replaced. */
     int SVCheck(std::vector<SVFinding>& findings) const noexcept;
 
-    // --- the orbit at a time
-    // -------------------------------------------------------------------------------------
+    // --- the orbit at a time ---------------------------------------------------------------------
 
     int SVGetPos(double t, double* xyz) noexcept;
     int SVGetVel(double t, double* vxyz) noexcept;
@@ -196,10 +194,10 @@ public:
     /** Whether the z velocity of the first state vector is above 0; false without vectors. */
     bool isAscending() const noexcept;
 
-    // --- from a sample to the ground
-    // ----------------------------------------------------------------------------- Status 10 where no ground
-    // point is seen: the range is shorter than the height or reaches beyond the horizon, or the velocity does not
-    // allow the Doppler.
+    // --- from a sample to the ground -------------------------------------------------------------
+    //
+    // Status 10 where no ground point is seen: the range is shorter than the height or reaches beyond the horizon,
+    // or the velocity does not allow the Doppler.
 
     /** Ground point seen from a given position with a given velocity, Doppler 0. Needs no state vectors. */
     int sat2earth(const double pos[3], const double vel[3], double range, double* xyz) noexcept;
@@ -227,10 +225,10 @@ public:
      * @return 0; 10 also where the line passes the Earth by. */
     int sat2earthSquinted(double t, double range, double squint, double* xyz, double* time) noexcept;
 
-    // --- from the ground to a sample
-    // ----------------------------------------------------------------------------- Status 12 where the point is
-    // not seen with that Doppler between the first and the last state vector. Up to 1e-4 s beyond them counts as
-    // between. Doppler 0 unless given.
+    // --- from the ground to a sample -------------------------------------------------------------
+    //
+    // Status 12 where the point is not seen with that Doppler between the first and the last state vector. Up to
+    // 1e-4 s beyond them counts as between. Doppler 0 unless given.
 
     /** Closed-form first guess of time and range time, extrapolated from the end runs for points beyond the orbit.
      *
@@ -254,9 +252,9 @@ public:
     double earth2satAzimuth(const double xyz[3]) noexcept;
     double earth2satAzimuth(double x, double y, double z) noexcept;
 
-    // --- geometry of a sample
-    // ------------------------------------------------------------------------------------ Of the ground point
-    // that sat2earth() finds. The short forms return not-a-number after a failure.
+    // --- geometry of a sample --------------------------------------------------------------------
+    //
+    // Of the ground point that sat2earth() finds. The short forms return not-a-number after a failure.
 
     /** Geodetic latitude, and longitude from -180 to 180. */
     int SVGetLatLon(double t, double range, double doppler, double* latitude, double* longitude) noexcept;
@@ -295,8 +293,9 @@ public:
      * @return 0; 1 for null; or the status of SVGetLatLon() or SVGetAngles() */
     int SVGetGeoCoords(geoCoords_Obj* grid, const GSRoi_Obj* roi) noexcept;
 
-    // --- polynomials derived from the orbit
-    // ---------------------------------------------------------------------- Least-squares fits of the geometry
+    // --- polynomials derived from the orbit ------------------------------------------------------
+    //
+    // Least-squares fits of the geometry
     // over a region's fast and slow start and length. `dc` tells the Doppler of every sample. 1 for a region or
     // Doppler that is null, 10 for a fit that does not give finite numbers, else the status of the sampled
     // geometry, of polfit() or of lfitd(). An output that is null is skipped; all outputs are unchanged on
