@@ -200,6 +200,34 @@ TEST(Earth2Sat, FindsANearPassOnAnOrbitOfManyRevolutions) {
     }
 }
 
+// An aircraft in a wide turn: straight flight is a poor guess, whichever vectors it joins, and the search goes on
+// from run to run.
+TEST(Earth2Sat, FollowsATurningAircraft) {
+    const test::LocalFrame at = test::local_frame(49.5, -97.7);
+    const Vec3 centre = test::geodetic_point(49.5, -97.7, 9e3);
+    const test::Times times{803457.3, 5.3, 40};
+    const auto motion = [&](double t) {
+        constexpr double kRadius = 21e3, kRate = 0.0097;
+        const double angle = kRate * (t - times.first_s), c = std::cos(angle), s = std::sin(angle);
+        const Vec3 out = c * at.east + s * at.north, on = c * at.north - s * at.east;
+        return test::Platform{centre + kRadius * out, kRadius * kRate * on, -kRadius * kRate * kRate * out};
+    };
+    GeneralSAROrbit orbit;
+    orbit.setLookSign(1);
+    test::make_orbit(orbit, times, motion);
+    for (int i = 0; i < 40; ++i) {
+        const double t_seen = times.first_s + 1.3 + i * 5.1;
+        const test::Platform platform = motion(t_seen);
+        const Vec3 target = platform.position + 11e3 * test::unit(platform.position - centre) + -8.7e3 * at.up;
+        for (const bool precise : {false, true}) {
+            double t = 0.0, range = 0.0;
+            EXPECT_EQ(
+                precise ? orbit.earth2satPrecise(target.v, &t, &range) : orbit.earth2sat(target.v, &t, &range), 0);
+            EXPECT_NEAR(t, t_seen, 1e-5);  // what runs of five make of such a turn
+        }
+    }
+}
+
 TEST(Earth2Sat, KnowsADopplerThatTheSpeedDoesNotAllow) {
     const test::CircularOrbit circle{41.3, 12.8, -12.7};
     GeneralSAROrbit orbit;

@@ -17,8 +17,6 @@
 
 namespace {
 
-using test::Vec3;
-
 constexpr test::Times kTimes{803457.3125, 9.75, 6};
 
 void fill(GeneralSAROrbit& orbit) {
@@ -64,7 +62,7 @@ std::string parameter_file(const GeneralSAROrbit& orbit, const std::string& key 
         if (name == key)
             text += line;
         else
-            text += name + " = " + value + "\n";
+            text.append(name).append(" = ").append(value).append("\n");
     }
     return text;
 }
@@ -86,7 +84,7 @@ protected:
     Header() { fill(orbit_); }
     /** A file of its own for every content: parameter files stay in memory under their names. */
     std::string file_of(const std::string& content) {
-        const std::string name = folder_.file("header" + std::to_string(++files_));
+        std::string name = folder_.file("header" + std::to_string(++files_));
         test::write_text(name, content);
         return name;
     }

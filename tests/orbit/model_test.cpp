@@ -73,6 +73,7 @@ const Choice kChoices[] = {
     {"EarlyEdgeTakesTheRunThatEndsThere", place(5, 0.05), place(4, 0.2), 4, 1},
     {"EarlyEdgeReachesABitBeforeTheRun", place(5, 0.05), place(3, 0.5), 4, 1},
     {"JumpBackTakesTheRunThatStartsThere", place(5, 0.05), place(3, 0.3), 4, 2},
+    {"JumpBackBeginsRightBeyondTheEarlyEdge", place(5, 0.05), place(3, 0.35), 4, 2},
     {"JumpAheadTakesTheRunThatStartsThere", place(5, 0.05), place(11, 0.5), 4, 10},
     {"LastRunIsTheEnd", place(5, 0.05), place(16, 0.0), 4, 12},
     {"BeyondTheLastVector", place(5, 0.05), place(16, 0.01), 4, 12},
@@ -136,7 +137,8 @@ TEST(Model, PassesThroughItsVectorsAndDifferentiatesItself) {
                   2e-6);  // of time's rounding
         EXPECT_LT(test::norm(test::velocity_at(orbit, kTimes.at(i)) - truth.velocity), 1e-4);
     }
-    for (double t = kTimes.first_s - 7.0; t < kTimes.last() + 7.0; t += 1.3) {
+    for (int i = 0; i < 130; ++i) {
+        const double t = kTimes.first_s - 7.0 + i * 1.3;
         const double h = std::ldexp(1.0, -3);
         ASSERT_EQ(orbit.updatePolys(t), 0);
         const auto updates = orbit.polyUpdates();
@@ -259,8 +261,13 @@ TEST(StateVectorRecord, FitsOnePolynomialThroughAll) {
         std::copy_n(state.velocity.v, 3, record.vSV_mOs + 3 * static_cast<std::ptrdiff_t>(i));
     }
     EXPECT_EQ(record.positionPoly(0), nullptr);
+    SAROrbitStateVectors_Obj unfitted;
+    ASSERT_EQ(record.clone(&unfitted), 0);
+    EXPECT_EQ(unfitted.SVGetPos(803457.3, xyz), QUO_REFUSED);
+    ASSERT_EQ(unfitted.SVPolyCompute(), 0);
     ASSERT_EQ(record.SVPolyCompute(), 0);
-    for (double u = 0.0; u < 77.0; u += 3.3) {
+    for (int step = 0; step < 24; ++step) {
+        const double u = step * 3.3;
         const test::Platform truth = circle.earth_fixed(u);
         Vec3 p{}, v{};
         ASSERT_EQ(record.SVGetPos(803457.3 + u, p.v), 0);

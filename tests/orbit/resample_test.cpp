@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "orbit/made_orbits.h"
+#include "support/diagnostics.h"
 #include "support/geometry.h"
 #include "support/scenes.h"
 
@@ -94,6 +95,23 @@ TEST_P(Resampled, ErrorIsEstimatedBefore) {
     }
 }
 
+// Where the orbit is roughest in its middle the runs there decide, and only the part of them in use.
+TEST(OrbitFitError, SeesARoughMiddle) {
+    const test::CircularOrbit circle{41.3, 12.8, -12.7};
+    const test::Times times{803457.3, 9.7, 33};
+    const auto motion = [&](double t) {
+        test::Platform state = circle.earth_fixed(t - times.first_s);
+        const double s = (t - times.at(16)) / 45.0;
+        state.position = state.position + Vec3{37.0 * std::exp(-s * s), 0.0, 0.0};
+        return state;
+    };
+    GeneralSAROrbit orbit;
+    test::make_orbit(orbit, times, motion);
+    const double truth = worst(orbit, times.first_s, times.last(), motion).position_m;
+    EXPECT_GT(truth, 1e-3);
+    EXPECT_NEAR(orbit.orbitFitError(), truth, truth / 3.0);
+}
+
 // Velocities that are not the positions' derivative would bend a curve that takes them by 12 cm between two
 // vectors.
 TEST(SVResample, LeavesWrongVelocitiesAside) {
@@ -108,6 +126,18 @@ TEST(SVResample, LeavesWrongVelocitiesAside) {
     });
     ASSERT_EQ(orbit.SVResample(10.0), 0);
     EXPECT_LT(worst(orbit, times.first_s, times.last(), motion).position_m, 1e-3);
+}
+
+TEST(SVResample, WritesWhatItMade) {
+    const test::CircularOrbit circle{41.3, 12.8, -12.7};
+    const test::TemporaryFolder folder;
+    GeneralSAROrbit orbit, back;
+    test::make_orbit(orbit, {803457.3, 60.0, 7}, [&](double t) { return circle.earth_fixed(t - 803457.3); });
+    ASSERT_EQ(orbit.SVResample(7.0), 0);
+    ASSERT_EQ(orbit.writehdr(folder.file("orbit.xml").c_str()), 0);
+    ASSERT_EQ(back.readhdr(folder.file("orbit.xml").c_str()), 0);
+    ASSERT_EQ(back.nSV_n, 53);
+    for (int i = 0; i < 3 * 53; ++i) EXPECT_NEAR(back.pSV_m[i], orbit.pSV_m[i], 1e-7);
 }
 
 TEST(SVResample, LeavesTheOrbitAsItWasWhenRefused) {
@@ -158,6 +188,17 @@ TEST_P(Resampled, CheckIsContentWithAnyGoodOrbit) {
     EXPECT_EQ(texts(check(orbit)), "");
 }
 
+// A spacing too wide for the model is not the vectors' fault.
+TEST(SVCheck, IsContentWithWideSpacing) {
+    const test::EllipticOrbit ellipse{41.3, 12.8, -12.7, 0.002};
+    for (const double spacing : {120.0, 240.0, 300.0}) {
+        GeneralSAROrbit orbit;
+        test::make_orbit(orbit, {803457.3, spacing, 9},
+                         [&](double t) { return ellipse.earth_fixed(t - 803957.3); });
+        EXPECT_EQ(texts(check(orbit)), "") << spacing;
+    }
+}
+
 class OneWrongVector : public testing::TestWithParam<int> {
 protected:
     OneWrongVector() {
@@ -198,6 +239,7 @@ TEST_P(OneWrongVector, NullPositionIsFound) {
 TEST_P(OneWrongVector, DuplicateIsFound) {
     const bool first = GetParam() == 0;  // has no predecessor: its successor is the duplicate
     std::copy_n(orbit_.pSV_m + at() + (first ? 3 : -3), 3, orbit_.pSV_m + at());
+    orbit_.pSV_m[at()] += 3.0;  // near enough
     const std::vector<SVFinding> findings = check(orbit_);
     ASSERT_FALSE(findings.empty());
     EXPECT_EQ(findings.back().problem, SVFinding::kDuplicate);

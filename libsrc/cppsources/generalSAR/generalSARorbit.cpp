@@ -29,8 +29,8 @@ quo::StateVectors states_of(const Obj& orbit) noexcept {
 
 /** Intervals of re-sampled vectors; 0 for more than can be counted. */
 std::int32_t intervals_for(double length, double spacing) noexcept {
-    constexpr double kLeast = quo::OrbitModel::kRunVectors - 1,
-                     kMost = std::numeric_limits<std::int32_t>::max() / 3 - 1;
+    constexpr double kLeast = quo::OrbitModel::kRunVectors - 1;
+    constexpr std::int32_t kMost = std::numeric_limits<std::int32_t>::max() / 3 - 1;
     // A length that is a multiple of the spacing but for rounding keeps the spacing.
     const double wanted = std::max(kLeast, std::ceil(length / spacing * (1.0 - 1e-12)));
     return wanted <= kMost ? static_cast<std::int32_t>(wanted) : 0;

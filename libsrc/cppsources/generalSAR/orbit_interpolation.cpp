@@ -41,7 +41,8 @@ double distance(const double a[3], const double b[3]) noexcept {
 template <std::size_t Most>
 std::span<const std::int32_t> nodes_around(double s, std::int32_t count, std::int32_t vectors,
                                            std::array<std::int32_t, Most>& room) noexcept {
-    const double first = std::clamp(std::ceil(s) - count / 2, 0.0, static_cast<double>(vectors - count));
+    const std::int32_t half = count / 2;
+    const double first = std::clamp(std::ceil(s) - half, 0.0, static_cast<double>(vectors - count));
     for (std::int32_t i = 0; i < count; ++i) room[std::size_t(i)] = static_cast<std::int32_t>(first) + i;
     return std::span{room}.first(std::size_t(count));
 }

@@ -51,7 +51,7 @@ std::unique_ptr<OrbitModel> OrbitModel::create(std::int32_t vectors) noexcept {
 }
 
 void OrbitModel::copy(const OrbitModel& other) noexcept {
-    static_cast<OrbitModelValues&>(*this) = other;
+    static_cast<OrbitModelValues&>(*this) = static_cast<const OrbitModelValues&>(other);
     std::copy_n(other.runs_.get(), runs_count_, runs_.get());
 }
 
@@ -121,7 +121,7 @@ void OrbitModel::choose(double t) noexcept {
 
 std::int32_t OrbitModel::centred_run(double spacings) const noexcept {
     const double inside = std::clamp(spacings, 0.0, static_cast<double>(vectors()));
-    return std::clamp(static_cast<std::int32_t>(inside + 0.5) - 2, 0, runs_count_ - 1);
+    return std::clamp(static_cast<std::int32_t>(std::lround(inside)) - 2, 0, runs_count_ - 1);
 }
 
 bool OrbitModel::linear_guess(const Vec3& point, double rate_m_s, double turn, PointTimes* guess) const noexcept {
@@ -141,7 +141,7 @@ double OrbitModel::coarse_guess(const Vec3& point, double lambda_m, double fd_hz
     // Three times the orbit's span: a guess may miss it by a little, and Newton's steps on their way by a lot.
     const TimeSpan span{-length(), 2.0 * length()};
     image_time({coarse_x_, coarse_y_, coarse_z_}, point, time, span, lambda_m, fd_hz, &time, &range_s);
-    return std::clamp(time, 0.0, length());
+    return time;
 }
 
 int OrbitModel::solve_near(double guess_since_first_s, const Vec3& point, double lambda_m, double fd_hz, double* t,

@@ -117,7 +117,7 @@ public:
         *since_first_s = (tc_ - t0_) + u;
         return dt_ <= u && u <= 3.0 * dt_;
     }
-    /** Time of a point on the coarse curve, for a first guess. */
+    /** Time of a point on the coarse curve since the first vector, for a first guess. */
     double coarse_guess(const Vec3& point, double lambda_m, double fd_hz) const noexcept;
     /** When the point is seen: Newton's method from a first guess, on the current run made to suit it. `t` is on
      * the absolute scale. 0, or 12 when the solution lies outside that run; nothing is then written. */
