@@ -3,6 +3,7 @@
 
 #include <chrono>
 #include <cstdint>
+#include <string>
 
 namespace tool {
 
@@ -10,23 +11,31 @@ namespace tool {
  * job takes longer than half a second, and is wiped away at the end. */
 class Progress {
 public:
-    Progress();
+    /** What is counted. */
+    enum class Unit { kRows, kBytes };
+
+    explicit Progress(Unit unit = Unit::kRows);
     ~Progress();
     Progress(const Progress&) = delete;
     Progress& operator=(const Progress&) = delete;
 
     /** `done` of `in_all`; in_all 0 where the end is not known, and then the rows are counted instead. */
     void show(std::int64_t done, std::int64_t in_all, std::int64_t rows);
+    /** `done` bytes of `in_all`, for jobs that go in large steps: with speed and the time that is left. */
+    void step(std::int64_t done, std::int64_t in_all);
     /** Takes the bar away, so that a message can stand in its place. */
     void wipe();
 
 private:
     using Clock = std::chrono::steady_clock;
 
+    void draw(const std::string& text);
+
     bool terminal_;
+    Unit unit_;
     bool visible_ = false;
     unsigned calls_ = 0;
-    Clock::time_point next_;
+    Clock::time_point start_, next_;
 };
 
 }  // namespace tool

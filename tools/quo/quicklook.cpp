@@ -1,0 +1,177 @@
+#include <algorithm>
+#include <cmath>
+#include <complex>
+#include <limits>
+#include <memory>
+#include <vector>
+
+#include "commands.h"
+#include "failure.h"
+#include "interrupt.h"
+#include "number.h"
+#include "picture.h"
+#include "progress.h"
+#include "raster.h"
+
+namespace tool {
+namespace {
+
+struct QuicklookOptions {
+    std::string raster, picture, looks, db = "auto";
+    int width = 1000;
+};
+
+struct Looks {
+    int azimuth, range;
+};
+struct Stretch {
+    double low_db, high_db;
+};
+
+Looks looks_of(const QuicklookOptions& options, const DataFile& raster) {
+    if (options.looks.empty()) {
+        // The same number both ways, so that neither the width nor four times it in height is exceeded.
+        const auto times = [](int length, std::int64_t most) {
+            return static_cast<int>((std::int64_t{length} + most - 1) / most);
+        };
+        const int looks = std::max({1, times(raster.NrOfPixelsPerLine, options.width),
+                                    times(raster.NrOfLinesPerImage, 4 * std::int64_t{options.width})});
+        return {looks, looks};
+    }
+    const auto x = options.looks.find('x');
+    const auto azimuth = finite_number(std::string_view{options.looks}.substr(0, x));
+    const auto range =
+        x == std::string::npos ? std::nullopt : finite_number(std::string_view{options.looks}.substr(x + 1));
+    if (!azimuth || !range || !(*azimuth >= 1.0 && *azimuth <= 1e6) || !(*range >= 1.0 && *range <= 1e6)) {
+        throw WrongUse("--looks " + options.looks + ": not of the form AxR, such as 4x1");
+    }
+    return {static_cast<int>(*azimuth), static_cast<int>(*range)};
+}
+
+/** The mean power of looks x looks samples each, over the whole raster, read line block by line block. */
+class Multilook {
+public:
+    Multilook(const DataFile& raster, const std::string& name, Looks looks) : looks_{looks}, file_{name.c_str()} {
+        file_.copyDescription(raster);
+        looks_.azimuth = std::min(looks.azimuth, raster.NrOfLinesPerImage);
+        looks_.range = std::min(looks.range, raster.NrOfPixelsPerLine);
+        // Looks at the far ends that are not full are left out.
+        width_ = static_cast<std::size_t>(raster.NrOfPixelsPerLine / looks_.range);
+        height_ = static_cast<std::size_t>(raster.NrOfLinesPerImage / looks_.azimuth);
+        if (file_.CellType >= INT8_COMPLEX) throw Failure(name + ": 8-bit samples are not supported");
+        file_.open(BufferFile::READ);
+        if (!file_.is_open()) throw Failure(name + ": cannot be opened");
+        power_.assign(width_ * height_, 0.0F);
+    }
+
+    void run() {
+        const int lines = static_cast<int>(height_) * looks_.azimuth;
+        const int per_block = block_lines(std::int64_t{file_.NrOfPixelsPerLine} * 8, lines);
+        const std::int64_t bytes_per_line = std::int64_t{file_.NrOfPixelsPerLine} * file_.element_sizeof();
+        Progress progress{Progress::Unit::kBytes};
+        for (int first = 0; first < lines; first += per_block) {
+            throw_if_interrupted();
+            const int count = std::min(per_block, lines - first);
+            if (file_.is_complex() != 0) {
+                add_block<fcomplex>(first, count);
+            } else {
+                add_block<float>(first, count);
+            }
+            progress.step((first + count) * bytes_per_line, lines * bytes_per_line);
+        }
+        const float scale = 1.0F / (static_cast<float>(looks_.azimuth) * static_cast<float>(looks_.range));
+        for (float& value : power_) value *= scale;
+    }
+
+    [[nodiscard]] std::size_t width() const { return width_; }
+    [[nodiscard]] std::size_t height() const { return height_; }
+    /** Row after row; values that are no number count as 0. */
+    [[nodiscard]] const std::vector<float>& power() const { return power_; }
+
+private:
+    template <typename T>
+    void add_block(int first, int lines) {
+        const auto samples = static_cast<std::size_t>(file_.NrOfPixelsPerLine);
+        std::vector<T> block(samples * static_cast<std::size_t>(lines));
+        file_.readbuffer(block.data(), first, lines, 0, 0);
+        for (int line = 0; line < lines; ++line) {
+            const T* from = block.data() + static_cast<std::size_t>(line) * samples;
+            float* to = power_.data() + static_cast<std::size_t>((first + line) / looks_.azimuth) * width_;
+            for (std::size_t pixel = 0; pixel < width_; ++pixel) {
+                for (int look = 0; look < looks_.range; ++look) {
+                    const float value = std::norm(*from++);
+                    to[pixel] += std::isfinite(value) ? value : 0.0F;
+                }
+            }
+        }
+    }
+
+    Looks looks_;
+    BufferFile file_;
+    std::size_t width_ = 0, height_ = 0;
+    std::vector<float> power_;
+};
+
+double decibel(float power) {
+    return power > 0.0F ? 10.0 * std::log10(static_cast<double>(power)) : -std::numeric_limits<double>::infinity();
+}
+
+// From the 2nd to the 98th percentile of what is not empty, and never less than 3 dB.
+Stretch automatic_stretch(const std::vector<float>& power) {
+    std::vector<float> filled;
+    std::ranges::copy_if(power, std::back_inserter(filled), [](float value) { return value > 0.0F; });
+    if (filled.empty()) return {0.0, 1.0};
+    const auto percentile = [&](double share) {
+        const auto index = static_cast<std::ptrdiff_t>(share * static_cast<double>(filled.size() - 1));
+        std::ranges::nth_element(filled, filled.begin() + index);
+        return decibel(filled[static_cast<std::size_t>(index)]);
+    };
+    const double low = percentile(0.02), high = percentile(0.98);
+    const double widen = std::max(0.0, 0.5 * (3.0 - (high - low)));
+    return {low - widen, high + widen};
+}
+
+Stretch stretch_of(const QuicklookOptions& options, const std::vector<float>& power) {
+    if (options.db == "auto") return automatic_stretch(power);
+    const auto colon = options.db.find(':');
+    const auto low = finite_number(std::string_view{options.db}.substr(0, colon));
+    const auto high =
+        colon == std::string::npos ? std::nullopt : finite_number(std::string_view{options.db}.substr(colon + 1));
+    if (!low || !high || !(*low < *high))
+        throw WrongUse("--db " + options.db + ": not of the form MIN:MAX or auto");
+    return {*low, *high};
+}
+
+int quicklook(const QuicklookOptions& options) {
+    if (options.width < 1) throw WrongUse("--width " + std::to_string(options.width));
+    DataFile raster;
+    read_description(options.raster, raster);
+    if (raster.NrOfLinesPerImage < 1 || raster.NrOfPixelsPerLine < 1) throw Failure(options.raster + ": is empty");
+    note_interrupts();
+    Multilook multilook{raster, options.raster, looks_of(options, raster)};
+    multilook.run();
+    const Stretch stretch = stretch_of(options, multilook.power());
+    Picture picture{multilook.width(), multilook.height(), {}};
+    picture.grey.reserve(multilook.power().size());
+    for (const float power : multilook.power()) {
+        const double share = (decibel(power) - stretch.low_db) / (stretch.high_db - stretch.low_db);
+        picture.grey.push_back(static_cast<std::uint8_t>(std::lround(255.0 * std::clamp(share, 0.0, 1.0))));
+    }
+    write_png(picture, options.picture);
+    return kFine;
+}
+
+}  // namespace
+
+void add_quicklook(CLI::App& app, Job& job) {
+    auto options = std::make_shared<QuicklookOptions>();
+    CLI::App* command = app.add_subcommand("quicklook", "Shows a raster as a picture: power in dB, multilooked");
+    command->add_option("RASTER", options->raster, "Raster with a side file RASTER.hdr")->required();
+    command->add_option("OUT", options->picture, "Picture to write (PNG)")->required();
+    command->add_option("--looks", options->looks, "Lines x samples averaged into a pixel, such as 4x1");
+    command->add_option("--db", options->db, "Black and white: MIN:MAX in dB, or auto (2nd to 98th percentile)");
+    command->add_option("--width", options->width, "Greatest width in pixels where --looks is not given");
+    command->callback([options, &job] { job = [options] { return quicklook(*options); }; });
+}
+
+}  // namespace tool
