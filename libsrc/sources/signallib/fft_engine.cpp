@@ -1,0 +1,87 @@
+#include "signallib/fft_engine.h"
+
+#include <dlfcn.h>
+
+#include <cstdlib>
+#include <memory>
+#include <string>
+
+#include "diagnosticslib/errno_kept.h"
+
+#if defined(__x86_64__) || defined(__i386__)
+#include <cpuid.h>
+#endif
+
+namespace quo {
+namespace {
+
+// Secure: a program with raised rights does not load what its caller names.
+const char* setting(const char* name) {
+    const char* value = secure_getenv(name);
+    return value && *value ? value : nullptr;
+}
+
+/** MKL picks slow generic code on processors of other makers, where FFTW is faster. */
+bool is_makers_processor() {
+#if defined(__x86_64__) || defined(__i386__)
+    unsigned greatest = 0, b = 0, c = 0, d = 0;
+    return __get_cpuid(0, &greatest, &b, &c, &d) && b == signature_INTEL_ebx && d == signature_INTEL_edx &&
+           c == signature_INTEL_ecx;
+#else
+    return false;
+#endif
+}
+
+FftEngine* open_module(const std::string& file) {
+    void* module = dlopen(file.c_str(), RTLD_NOW | RTLD_LOCAL);
+    if (!module) return nullptr;
+    const auto entry = reinterpret_cast<FftwEntry>(dlsym(module, kFftwEntryName));
+    FftEngine* engine = entry ? entry(kFftInterfaceVersion) : nullptr;
+    if (!engine) dlclose(module);  // else it stays for good, as do its plans
+    return engine;
+}
+
+/** Folder of the library or program that holds this code, with a slash; empty where it cannot be told. */
+std::string own_folder() {
+    Dl_info info{};
+    if (!dladdr(reinterpret_cast<const void*>(&fft_engine), &info) || !info.dli_fname) return {};
+    const std::string file = info.dli_fname;
+    return file.substr(0, file.rfind('/') + 1);  // a name without a slash gives an empty one
+}
+
+FftEngine* mkl() { return load_mkl_engine(setting("QUO_MKL_LIBRARY")); }
+FftEngine* fftw() { return load_fftw_engine(setting("QUO_FFTW_MODULE")); }
+
+FftEngine* chosen = nullptr;
+
+}  // namespace
+
+FftEngine* load_fftw_engine(const char* file) noexcept try {
+    if (file) return open_module(file);
+    const std::string folder = own_folder();
+    if (folder.empty()) return nullptr;
+    FftEngine* engine = open_module(folder + "quo_base/libquo_base_fftw.so");
+    return engine ? engine : open_module(folder + "libquo_base_fftw.so");
+} catch (...) {
+    return nullptr;  // out of memory
+}
+
+EngineOrder engine_order(std::string_view choice, bool makers_processor) noexcept {
+    if (choice == "mkl") return {mkl, nullptr};
+    if (choice == "fftw") return {fftw, nullptr};
+    return makers_processor ? EngineOrder{mkl, fftw} : EngineOrder{fftw, mkl};
+}
+
+FftEngine* fft_engine() noexcept {
+    if (chosen) return chosen;
+    const ErrnoKept kept;
+    const char* choice = setting("QUO_FFT_ENGINE");
+    const EngineOrder order = engine_order(choice ? choice : "auto", is_makers_processor());
+    chosen = order.first();
+    if (!chosen && order.second) chosen = order.second();
+    return chosen;
+}
+
+void forget_fft_engine() noexcept { chosen = nullptr; }
+
+}  // namespace quo

@@ -1,0 +1,92 @@
+#ifndef QUO_FFT_ENGINE_H
+#define QUO_FFT_ENGINE_H
+
+#include <cstddef>
+#include <memory>
+#include <string_view>
+
+namespace quo {
+
+enum class FftDomain { Complex, Real };
+
+/** A batch of one-dimensional single-precision transforms. Strides and distances count samples: pairs of floats of
+ * complex data, floats of real data. They are the same for input and output. */
+struct FftGeometry {
+    FftDomain domain = FftDomain::Complex;
+    int length = 1;               ///< samples of a transform
+    int count = 1;                ///< transforms
+    std::ptrdiff_t stride = 1;    ///< from one sample of a transform to the next
+    std::ptrdiff_t distance = 1;  ///< from one transform to the next
+    bool forward = true;          ///< exponent sign -1; real data: from samples to the packed spectrum
+    bool in_place = true;
+
+    bool operator==(const FftGeometry&) const = default;
+};
+
+/** Floats of a sample. */
+constexpr std::ptrdiff_t floats_of(FftDomain domain) { return domain == FftDomain::Complex ? 2 : 1; }
+
+/** A batch made ready by an engine. */
+class FftBatch {
+public:
+    FftBatch() = default;
+    FftBatch(const FftBatch&) = delete;
+    FftBatch& operator=(const FftBatch&) = delete;
+    virtual ~FftBatch() = default;
+
+    /** Transforms unscaled, from `in` to `out`: the same for a batch in place, apart otherwise, aligned as floats
+     * at least. False when the engine failed. */
+    virtual bool run(const float* in, float* out) noexcept = 0;
+};
+
+/** What computes the transforms. Loaded at run time, lives until the process ends. */
+class FftEngine {
+public:
+    FftEngine() = default;
+    FftEngine(const FftEngine&) = delete;
+    FftEngine& operator=(const FftEngine&) = delete;
+    virtual ~FftEngine() = default;
+
+    [[nodiscard]] virtual const char* name() const noexcept = 0;
+    /** Columns of so many rows and more are faster through a tile of neighbouring columns. */
+    [[nodiscard]] virtual int tiled_from() const noexcept = 0;
+    /** Null when the batch cannot be had. Takes memory of its own to measure on. */
+    [[nodiscard]] virtual std::unique_ptr<FftBatch> make(const FftGeometry& geometry) noexcept = 0;
+};
+
+// ---- The FFTW engine: a module of its own, which alone holds FFTW ----
+
+/** The module's only exported function. Null for another version of the interface than its own. */
+using FftwEntry = FftEngine* (*)(int interface_version);
+inline constexpr int kFftInterfaceVersion = 1;
+inline constexpr const char* kFftwEntryName = "quo_base_fftw_engine";
+
+/** Loads the module: from `file`, or where that is null from the folder of this library, quo_base/ below it first.
+ * Null when it cannot be loaded. */
+[[nodiscard]] FftEngine* load_fftw_engine(const char* file) noexcept;
+
+// ---- The MKL engine ----
+
+/** Loads MKL: from `file`, or where that is null by its usual names. Null when it cannot be loaded. */
+[[nodiscard]] FftEngine* load_mkl_engine(const char* file) noexcept;
+
+// ---- The choice ----
+
+/** Which engine to try first, and which next; null ends the list. */
+struct EngineOrder {
+    FftEngine* (*first)();
+    FftEngine* (*second)();
+};
+/** `choice` is the value of QUO_FFT_ENGINE; anything but "mkl" and "fftw" counts as "auto". */
+[[nodiscard]] EngineOrder engine_order(std::string_view choice, bool makers_processor) noexcept;
+
+/** The engine of the process, chosen at the first call; null where none can be loaded. As long as there is none,
+ * each call tries again. */
+[[nodiscard]] FftEngine* fft_engine() noexcept;
+
+/** Lets the next plan choose anew. Plans at hand keep their engine. For tests. */
+void forget_fft_engine() noexcept;
+
+}  // namespace quo
+
+#endif

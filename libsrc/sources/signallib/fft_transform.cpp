@@ -1,0 +1,162 @@
+#include "signallib/fft_transform.h"
+
+#include <algorithm>
+#include <bit>
+#include <cstring>
+#include <tuple>
+
+#include "quo_base/fft.h"
+
+namespace quo {
+namespace {
+
+/** Rows that are run together fill about so much of the nearest cache. */
+constexpr std::ptrdiff_t kRowBlockBytes = 32 << 10;
+/** Samples of a group of columns: bounds what measuring a strided batch costs. */
+constexpr int kGroupSamples = 1 << 21;
+constexpr int kLine = 16;  ///< groups of columns are multiples of whole cache lines
+
+int divide_up(int a, int b) { return a / b + (a % b != 0 ? 1 : 0); }
+
+int row_block(const FftGeometry& rows) {
+    const auto bytes = rows.length * floats_of(rows.domain) * static_cast<std::ptrdiff_t>(sizeof(float));
+    // Blocks of an even number of rows start at the alignment of the first, whatever the distance.
+    const std::ptrdiff_t least = rows.distance % 2 != 0 ? 2 : 1;
+    const auto fitting = static_cast<std::size_t>(std::max(kRowBlockBytes / bytes, least));
+    return static_cast<int>(std::min(std::bit_floor(fitting), static_cast<std::size_t>(rows.count)));
+}
+
+int column_block(const FftGeometry& columns) {
+    const int most = std::max(kGroupSamples / columns.length, kLine);
+    if (columns.count <= most) return columns.count;
+    const int groups = divide_up(columns.count, most);
+    return divide_up(divide_up(columns.count, groups), kLine) * kLine;
+}
+
+FftGeometry with_count(FftGeometry geometry, int count) {
+    geometry.count = count;
+    return geometry;
+}
+
+/** The engine's plans for whole blocks and for what is left at the end. */
+struct BlockBatches {
+    BlockBatches(FftEngine& engine, const FftGeometry& block, int total) : whole{engine.make(block)} {
+        const int left = total % block.count;
+        if (left != 0) rest = engine.make(with_count(block, left));
+        ready = whole && (left == 0 || rest);
+    }
+    [[nodiscard]] FftBatch& of(int count, int block) const { return count == block ? *whole : *rest; }
+
+    std::unique_ptr<FftBatch> whole, rest;
+    bool ready = false;
+};
+
+/** Runs blocks where they lie. */
+class BlockedTransform final : public FftTransform {
+public:
+    BlockedTransform(FftEngine& engine, const FftGeometry& geometry, int block)
+        : FftTransform{geometry, block}, batches_{engine, with_count(geometry, block), geometry.count} {}
+    [[nodiscard]] bool ready() const { return batches_.ready; }
+    [[nodiscard]] std::size_t held_bytes() const noexcept override { return 0; }
+
+    bool run(const float* in, float* out, int first, int count, FftFactors factors) noexcept override {
+        for (int k = first; k < first + count; k += block_) {
+            const int width = std::min(block_, geometry_.count - k);
+            const auto offset = k * geometry_.distance * floats_of(geometry_.domain);
+            if (!batches_.of(width, block_).run(in + offset, out + offset)) return false;
+            multiply(out + offset, width, factors);
+        }
+        return true;
+    }
+
+private:
+    void multiply(float* data, int width, FftFactors factors) const noexcept {
+        const auto floats = floats_of(geometry_.domain);
+        const auto [rows, samples, pitch] =
+            geometry_.stride == 1
+                ? std::tuple<std::ptrdiff_t, std::ptrdiff_t, std::ptrdiff_t>{width, geometry_.length,
+                                                                             geometry_.distance}
+                : std::tuple<std::ptrdiff_t, std::ptrdiff_t, std::ptrdiff_t>{geometry_.length, width,
+                                                                             geometry_.stride};
+        multiply_rows(data, rows, samples * floats, pitch * floats, factors);
+    }
+
+    BlockBatches batches_;
+};
+
+/** Copies neighbouring columns into a tile that stays in the cache, transforms them there and copies them back.
+ * The tile keeps the image's rows: turning them into columns costs more than it gains. */
+class TiledColumns final : public FftTransform {
+public:
+    TiledColumns(FftEngine& engine, const FftGeometry& columns, int width)
+        : FftTransform{columns, width},
+          batches_{engine, tile_geometry(columns, width), columns.count},
+          bytes_{tile_bytes(columns.length, width)},
+          tile_{static_cast<float*>(fft_malloc(bytes_)), &fft_free} {}
+    [[nodiscard]] bool ready() const { return batches_.ready && tile_; }
+    [[nodiscard]] std::size_t held_bytes() const noexcept override { return bytes_; }
+
+    bool run(const float* in, float* out, int first, int count, FftFactors factors) noexcept override {
+        for (int k = first; k < first + count; k += block_) {
+            const int width = std::min(block_, geometry_.count - k);
+            copy(in + 2 * std::ptrdiff_t{k}, 2 * geometry_.stride, tile_.get(), pitch(), width);
+            if (!batches_.of(width, block_).run(tile_.get(), tile_.get())) return false;
+            multiply_rows(tile_.get(), geometry_.length, 2 * std::ptrdiff_t{width}, pitch(), factors);
+            copy(tile_.get(), pitch(), out + 2 * std::ptrdiff_t{k}, 2 * geometry_.stride, width);
+        }
+        return true;
+    }
+
+private:
+    static FftGeometry tile_geometry(FftGeometry columns, int width) {
+        columns.count = columns.count < width ? columns.count : width;
+        columns.stride = width;
+        columns.in_place = true;
+        return columns;
+    }
+    static std::size_t tile_bytes(int length, int width) {
+        return static_cast<std::size_t>(length) * static_cast<std::size_t>(width) * 2 * sizeof(float);
+    }
+    [[nodiscard]] std::ptrdiff_t pitch() const noexcept { return 2 * std::ptrdiff_t{block_}; }
+    void copy(const float* from, std::ptrdiff_t from_pitch, float* to, std::ptrdiff_t to_pitch,
+              int width) const noexcept {
+        const std::size_t bytes = 2 * sizeof(float) * static_cast<std::size_t>(width);
+        for (int row = 0; row < geometry_.length; ++row) {
+            std::memcpy(to, from, bytes);
+            from += from_pitch;
+            to += to_pitch;
+        }
+    }
+
+    BlockBatches batches_;
+    std::size_t bytes_;
+    std::unique_ptr<float, void (*)(void*)> tile_;
+};
+
+/** Narrower tiles waste half of each access to memory; very long columns would leave even the last cache. */
+int tile_width(int length) { return length <= 65536 ? 32 : 8; }
+
+template <typename Transform>
+std::unique_ptr<FftTransform> if_ready(std::unique_ptr<Transform> transform) {
+    if (!transform->ready()) return nullptr;
+    return transform;
+}
+
+}  // namespace
+
+void multiply_rows(float* data, std::ptrdiff_t rows, std::ptrdiff_t floats, std::ptrdiff_t pitch,
+                   FftFactors factors) noexcept {
+    if (factors.first == 1.0F && factors.second == 1.0F) return;
+    for (std::ptrdiff_t row = 0; row < rows; ++row, data += pitch)
+        for (std::ptrdiff_t k = 0; k < floats; ++k) data[k] = data[k] * factors.first * factors.second;
+}
+
+std::unique_ptr<FftTransform> make_fft_transform(FftEngine& engine, const FftGeometry& geometry) {
+    const bool columns = geometry.stride != 1;
+    if (columns && geometry.domain == FftDomain::Complex && geometry.length >= engine.tiled_from())
+        return if_ready(std::make_unique<TiledColumns>(engine, geometry, tile_width(geometry.length)));
+    const int block = columns ? column_block(geometry) : row_block(geometry);
+    return if_ready(std::make_unique<BlockedTransform>(engine, geometry, block));
+}
+
+}  // namespace quo

@@ -1,0 +1,50 @@
+#include "signallib/plan_store.h"
+
+#include <algorithm>
+
+namespace quo {
+
+FftEnginePlan* PlanStore::open(FftEngine& engine, const FftGeometry& geometry) {
+    std::shared_ptr<FftTransform> transform = transform_for(engine, geometry);
+    if (!transform) return nullptr;
+    const std::uintptr_t key = next_;
+    held_.emplace(key, std::move(transform));
+    next_ += 2;
+    return reinterpret_cast<FftEnginePlan*>(key);  // NOLINT(performance-no-int-to-ptr): never followed
+}
+
+FftTransform* PlanStore::find(const FftEnginePlan* handle) const noexcept {
+    const auto found = held_.find(key_of(handle));
+    return found == held_.end() ? nullptr : found->second.get();
+}
+
+std::shared_ptr<FftTransform> PlanStore::transform_for(FftEngine& engine, const FftGeometry& geometry) {
+    const auto found = std::find_if(kept_.begin(), kept_.end(), [&](const Kept& kept) {
+        return kept.engine == &engine && kept.transform->geometry() == geometry;
+    });
+    if (found != kept_.end()) {
+        std::rotate(kept_.begin(), found, found + 1);
+        return kept_.front().transform;
+    }
+    std::shared_ptr<FftTransform> transform = make_fft_transform(engine, geometry);
+    if (transform) keep(engine, transform);
+    return transform;
+}
+
+void PlanStore::keep(FftEngine& engine, const std::shared_ptr<FftTransform>& transform) {
+    kept_.insert(kept_.begin(), Kept{&engine, transform});
+    kept_bytes_ += transform->held_bytes();
+    // The newest stays in any case, however large.
+    while (kept_.size() > 1 && (kept_.size() > kMostKept || kept_bytes_ > kMostKeptBytes)) {
+        kept_bytes_ -= kept_.back().transform->held_bytes();
+        kept_.pop_back();
+    }
+}
+
+PlanStore& plan_store() {
+    // Never destroyed: objects that outlive this file's statics may still release their plans.
+    static PlanStore& store = *new PlanStore;
+    return store;
+}
+
+}  // namespace quo

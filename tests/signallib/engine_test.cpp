@@ -1,0 +1,143 @@
+#include <dlfcn.h>
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include "signallib/engines.h"
+#include "signallib/fft_engine.h"
+#include "signallib/plan_store.h"
+#include "support/diagnostics.h"
+
+namespace {
+
+using test::Engine;
+using test::Samples;
+
+TEST(FftEngine, IsTheOneAskedForOrTheOneThereIs) {
+    const std::string fake = QUO_TEST_FAKE_DFTI, module = QUO_TEST_FFTW_MODULE, none = "/nowhere/lib.so";
+    struct Row {
+        std::string choice, mkl, fftw, name;
+    };
+    for (const Row& row : {Row{"mkl", fake, module, "mkl"},
+                           {"fftw", fake, module, "fftw"},
+                           {"auto", fake, none, "mkl"},
+                           {"auto", none, module, "fftw"},
+                           {"", none, module, "fftw"},
+                           {"mkl", none, module, "none"},
+                           {"fftw", fake, none, "none"},
+                           {"auto", none, none, "none"},
+                           {"auto", none, fake, "none"},
+                           {"auto", module, none, "none"}}) {
+        const Engine engine{row.choice, row.mkl, row.fftw};
+        EXPECT_STREQ(fft_engine_name(), row.name.c_str()) << row.choice << " " << row.mkl << " " << row.fftw;
+        EXPECT_EQ(errno, 0) << "what the loader left";
+    }
+}
+
+TEST(FftEngine, AutoPrefersMklOnProcessorsOfItsMakerOnly) {
+    const auto own = quo::engine_order("auto", true), other = quo::engine_order("auto", false);
+    EXPECT_EQ(own.first, quo::engine_order("mkl", false).first);
+    EXPECT_EQ(own.second, quo::engine_order("fftw", true).first);
+    EXPECT_EQ(other.first, own.second);
+    EXPECT_EQ(other.second, own.first);
+    EXPECT_EQ(quo::engine_order("mkl", true).second, nullptr);
+}
+
+TEST(FftEngine, MissingIsReportedOncePerPlanWithAWayOut) {
+    const test::Report report;
+    const Engine engine{"auto", "/nowhere/mkl.so", "/nowhere/fftw.so"};
+    FftPlan plan{};
+    EXPECT_EQ(fft_makep_c(&plan, 8, 8, 4, 4, 1, 1, 1), 4);
+    EXPECT_EQ(fft_makep_c(&plan, 8, 8, 4, 4, 0, 1, 1), 5);
+    EXPECT_EQ(fft_makep_c(&plan, 8, 8, 4, 4, 0, 0, 1), 0) << "nothing to transform";
+    const auto errors = report.entries("ERROR");
+    ASSERT_EQ(errors.size(), 2U);
+    EXPECT_NE(errors[0].message.find("QUO_FFTW_MODULE"), std::string::npos);
+    EXPECT_EQ(errors[0].function, "fft_makep_c()");
+}
+
+TEST(FftEngine, MklIsMadeSequentialAndGivesDescriptorsBack) {
+    const Engine engine{"mkl"};
+    ASSERT_STREQ(fft_engine_name(), "mkl");
+    void* const library = dlopen(QUO_TEST_FAKE_DFTI, RTLD_NOW | RTLD_NOLOAD);
+    ASSERT_NE(library, nullptr);
+    const auto layer = reinterpret_cast<int (*)()>(dlsym(library, "fake_threading_layer"));
+    const auto live = reinterpret_cast<long (*)()>(dlsym(library, "fake_live_descriptors"));
+    EXPECT_EQ(layer(), 1);
+    const long before = live();
+    for (const char* call : {"create", "set", "commit"}) {
+        setenv("FAKE_DFTI_FAILS", call, 1);
+        FftPlan plan{};
+        EXPECT_EQ(fft_makep_c(&plan, 27, 27, 4, 4, 1, 0, 1), 4) << call;
+        EXPECT_EQ(fft_makep_c(&plan, 27, 27, 4, 4, 0, 1, 1), 5) << call;
+        EXPECT_EQ(live(), before) << call;
+    }
+    setenv("FAKE_DFTI_FAILS", "compute", 1);
+    Samples data = test::noise(27);
+    EXPECT_EQ(fft_c(27, 27, 1, 1, 1, 0, data.data(), data.data()), QUO_NO_MEMORY);
+    unsetenv("FAKE_DFTI_FAILS");
+    dlclose(library);
+}
+
+TEST(FftwModule, ExportsItsEntryAloneAndRefusesOtherInterfaces) {
+    void* const module = dlopen(QUO_TEST_FFTW_MODULE, RTLD_NOW | RTLD_LOCAL);
+    ASSERT_NE(module, nullptr) << dlerror();
+    const auto entry = reinterpret_cast<quo::FftwEntry>(dlsym(module, quo::kFftwEntryName));
+    ASSERT_NE(entry, nullptr);
+    EXPECT_EQ(entry(quo::kFftInterfaceVersion + 1), nullptr);
+    EXPECT_NE(entry(quo::kFftInterfaceVersion), nullptr);
+    EXPECT_EQ(dlsym(module, "fftwf_plan_dft_1d"), nullptr);
+    EXPECT_EQ(dlsym(module, "fftwf_execute"), nullptr);
+    dlclose(module);
+}
+
+/** Counts what is made of it; makes batches that do nothing. */
+class CountingEngine final : public quo::FftEngine {
+public:
+    class Batch final : public quo::FftBatch {
+        bool run(const float* /*in*/, float* /*out*/) noexcept override { return true; }
+    };
+    [[nodiscard]] const char* name() const noexcept override { return "counting"; }
+    [[nodiscard]] int tiled_from() const noexcept override { return 2048; }
+    [[nodiscard]] std::unique_ptr<quo::FftBatch> make(const quo::FftGeometry& /*geometry*/) noexcept override {
+        ++made;
+        return std::make_unique<Batch>();
+    }
+    int made = 0;
+};
+
+quo::FftGeometry row_of(int length) { return {quo::FftDomain::Complex, length, 1, 1, length, true, true}; }
+
+TEST(PlanStore, MeasuresAGeometryOnceAndForgetsTheOneUsedLongestAgo) {
+    CountingEngine engine;
+    quo::PlanStore store;
+    const auto made_by = [&](int length) {
+        const int before = engine.made;
+        store.close(store.open(engine, row_of(length)));
+        return engine.made - before;
+    };
+    constexpr int kMost = quo::PlanStore::kMostKept;
+    for (int length = 1; length <= kMost; ++length) EXPECT_EQ(made_by(length), 1);
+    EXPECT_EQ(made_by(1), 0);  // used again: 2 is the oldest now
+    EXPECT_EQ(made_by(kMost + 1), 1);
+    EXPECT_EQ(store.kept(), quo::PlanStore::kMostKept);
+    EXPECT_EQ(made_by(1), 0);
+    EXPECT_EQ(made_by(2), 1);
+    EXPECT_EQ(store.held(), 0U);
+}
+
+TEST(PlanStore, BoundsTheMemoryOfWhatItKeeps) {
+    CountingEngine engine;
+    quo::PlanStore store;
+    constexpr int kLength = 60000;  // a tile of 15 MB
+    FftEnginePlan* const held = store.open(engine, {quo::FftDomain::Complex, kLength, 40, 64, 1, true, true});
+    for (int extra = 1; extra <= 8; ++extra)
+        store.close(store.open(engine, {quo::FftDomain::Complex, kLength + extra, 40, 64, 1, true, true}));
+    EXPECT_EQ(store.kept(), quo::PlanStore::kMostKeptBytes / (kLength * 32 * sizeof(fcomplex)));
+    EXPECT_NE(store.find(held), nullptr) << "a caller's plan stays, kept or not";
+    EXPECT_TRUE(store.close(held));
+    EXPECT_EQ(store.find(held), nullptr);
+    EXPECT_FALSE(store.close(held));
+}
+
+}  // namespace

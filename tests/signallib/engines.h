@@ -1,0 +1,85 @@
+#ifndef QUO_TESTS_SIGNALLIB_ENGINES_H
+#define QUO_TESTS_SIGNALLIB_ENGINES_H
+
+#include <gtest/gtest.h>
+
+#include <cerrno>
+#include <complex>
+#include <cstdlib>
+#include <numbers>
+#include <random>
+#include <string>
+#include <vector>
+
+#include "quo_base/fft.h"
+#include "signallib/fft_engine.h"
+
+namespace test {
+
+using Samples = std::vector<fcomplex>;
+using Exact = std::vector<dcomplex>;
+
+/** Chooses the engine of the following plans; gives the choice back when it goes. */
+class Engine {
+public:
+    explicit Engine(const std::string& choice, const std::string& mkl = QUO_TEST_FAKE_DFTI,
+                    const std::string& fftw = QUO_TEST_FFTW_MODULE) {
+        setenv("QUO_FFT_ENGINE", choice.c_str(), 1);
+        mkl.empty() ? unsetenv("QUO_MKL_LIBRARY") : setenv("QUO_MKL_LIBRARY", mkl.c_str(), 1);
+        setenv("QUO_FFTW_MODULE", fftw.c_str(), 1);
+        quo::forget_fft_engine();
+    }
+    ~Engine() {
+        for (const char* name : {"QUO_FFT_ENGINE", "QUO_MKL_LIBRARY", "QUO_FFTW_MODULE"}) unsetenv(name);
+        quo::forget_fft_engine();
+        errno = 0;
+    }
+    Engine(const Engine&) = delete;
+    Engine& operator=(const Engine&) = delete;
+};
+
+/** The engines that every plan must work with: FFTW, a stand-in for DFTI, and MKL itself where it is installed. */
+struct EngineChoice {
+    const char *name, *choice, *mkl;
+};
+inline constexpr EngineChoice kEngines[] = {
+    {"Fftw", "fftw", ""}, {"DftiStandIn", "mkl", QUO_TEST_FAKE_DFTI}, {"Mkl", "mkl", ""}};
+
+class WithEngine : public testing::TestWithParam<EngineChoice> {
+protected:
+    void SetUp() override {
+        if (std::string{fft_engine_name()} == "none") GTEST_SKIP() << "not installed here";
+    }
+
+private:
+    Engine engine_{GetParam().choice, GetParam().mkl};
+};
+
+inline Samples noise(std::size_t count, unsigned seed = 17) {
+    std::mt19937 generator{seed};
+    std::normal_distribution<float> normal;
+    Samples samples(count);
+    for (fcomplex& sample : samples) sample = {normal(generator), normal(generator)};
+    return samples;
+}
+
+/** exp(sign 2 pi i k / n), exact for any k. */
+inline dcomplex root(std::size_t k, std::size_t n, double sign = -1.0) {
+    return std::polar(1.0, sign * 2.0 * std::numbers::pi * static_cast<double>(k % n) / static_cast<double>(n));
+}
+
+/** Root mean square of the difference, relative to that of the expected values. */
+template <typename Got, typename Expected>
+double relative_error(const Got& got, const Expected& expected) {
+    double error = 0.0, size = 0.0;
+    for (std::size_t k = 0; k < expected.size(); ++k) {
+        const dcomplex truth{expected[k]};
+        error += std::norm(dcomplex{got[k]} - truth);
+        size += std::norm(truth);
+    }
+    return got.size() != expected.size() ? INFINITY : size > 0.0 ? std::sqrt(error / size) : std::sqrt(error);
+}
+
+}  // namespace test
+
+#endif

@@ -1,0 +1,443 @@
+#include "quo_base/fft.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <climits>
+#include <cmath>
+#include <fstream>
+#include <sstream>
+
+#include "signallib/engines.h"
+
+namespace {
+
+using test::Exact;
+using test::relative_error;
+using test::root;
+using test::Samples;
+
+/** The documented bound on a forward transform's error. */
+double bound(int n) { return 2e-7 * std::max(1.0, std::log2(n)); }
+
+/** Splits off factors until a prime is left, whose transform is taken from the definition. In double precision. */
+Exact transform(const Exact& x) {
+    const std::size_t n = x.size();
+    std::size_t p = 2;
+    while (p * p <= n && n % p != 0) ++p;
+    if (n % p != 0) p = n;
+    if (n == 1) return x;
+    Exact roots(n);
+    for (std::size_t k = 0; k < n; ++k) roots[k] = root(k, n);
+    Exact y(n);
+    for (std::size_t part = 0; part < p; ++part) {
+        Exact slice(n / p);
+        for (std::size_t k = 0; k < slice.size(); ++k) slice[k] = x[k * p + part];
+        slice = transform(slice);
+        for (std::size_t k = 0, turn = 0; k < n; ++k, turn += part) y[k] += roots[turn % n] * slice[k % (n / p)];
+    }
+    return y;
+}
+
+/** Any length by three transforms of a power of two: for primes too long for the definition. */
+Exact transform_by_chirp(const Exact& x) {
+    const std::size_t n = x.size();
+    std::size_t length = 1;
+    while (length < 2 * n - 1) length *= 2;
+    Exact a(length), b(length);
+    for (std::size_t k = 0; k < n; ++k) {
+        const dcomplex chirp = root(k * k % (2 * n), 2 * n);
+        a[k] = x[k] * chirp;
+        b[k] = b[(length - k) % length] = std::conj(chirp);
+    }
+    a = transform(a);
+    b = transform(b);
+    for (std::size_t k = 0; k < length; ++k) a[k] = std::conj(a[k] * b[k]);
+    a = transform(a);
+    Exact y(n);
+    for (std::size_t k = 0; k < n; ++k)
+        y[k] = std::conj(a[k]) / static_cast<double>(length) * root(k * k % (2 * n), 2 * n);
+    return y;
+}
+
+Exact exact_spectrum(const Exact& x) { return x.size() > 10000 ? transform_by_chirp(x) : transform(x); }
+
+using Fft = test::WithEngine;
+
+TEST_P(Fft, ForwardTransformsAreWithinTheBoundForEveryLength) {
+    std::vector<int> lengths{1080, 4096, 4099};
+    // The stand-in takes the definition as it stands, so that long transforms would take minutes.
+    const bool stand_in = std::string_view{GetParam().name} == "DftiStandIn";
+    for (int n = 1; n <= (stand_in ? 64 : 512); ++n) lengths.push_back(n);
+    if (stand_in) lengths.erase(lengths.begin(), lengths.begin() + 3);
+    if (!stand_in) lengths.insert(lengths.end(), {5760, 65537});
+    for (const int n : lengths) {
+        const Samples x = test::noise(static_cast<std::size_t>(n));
+        Samples y(x.size());
+        ASSERT_EQ(fft_c(n, n, 1, 1, 1, 0, x.data(), y.data()), 0) << n;
+        if (n == 1) y = x;  // a length of 1 is skipped
+        ASSERT_LE(relative_error(y, exact_spectrum({x.begin(), x.end()})), bound(n)) << n;
+    }
+}
+
+/** An image larger than the part that is transformed. Sizes above 2048 rows go through a tile. */
+struct Shape {
+    int n, nfft, m, mfft;
+};
+constexpr Shape kShapes[] = {{9, 7, 11, 10}, {16, 16, 6, 6},     {40, 37, 2052, 2049}, {64, 64, 2048, 2048},
+                             {5, 1, 6, 6},   {2049, 2049, 3, 2}, {70, 33, 20, 1},      {1, 1, 12, 12}};
+
+/** The plain way: one row or column after the other. */
+Samples expected_image(const Shape& s, const Samples& in, bool rows) {
+    Samples out = in;
+    const int length = rows ? s.nfft : s.mfft, count = rows ? s.mfft : s.nfft;
+    for (int t = 0; t < count; ++t) {
+        const auto at = [&](int k) { return static_cast<std::size_t>(rows ? t * s.n + k : k * s.n + t); };
+        Exact x;
+        for (int k = 0; k < length; ++k) x.emplace_back(in[at(k)]);
+        x = transform(x);
+        for (int k = 0; k < length; ++k) out[at(k)] = fcomplex{x[static_cast<std::size_t>(k)]};
+    }
+    return out;
+}
+
+TEST_P(Fft, RowsAndColumnsTransformTheirPartOfTheImageOnly) {
+    for (const Shape& s : kShapes) {
+        if (std::string_view{GetParam().name} == "DftiStandIn" && s.n * s.m > 1000) continue;
+        SCOPED_TRACE(testing::Message() << s.nfft << " of " << s.n << " by " << s.mfft << " of " << s.m);
+        const Samples in = test::noise(static_cast<std::size_t>(s.n * s.m));
+        const Samples rows = expected_image(s, in, true), columns = expected_image(s, in, false);
+        const Samples both = expected_image(s, rows, false);
+        for (const auto& [dir_rows, dir_cols, expected] :
+             {std::tuple{1, 0, &rows}, std::tuple{0, 1, &columns}, std::tuple{1, 1, &both}}) {
+            Samples inside = in, apart(in.size(), fcomplex{-999.0F});
+            ASSERT_EQ(fft_c(s.n, s.nfft, s.m, s.mfft, dir_rows, dir_cols, inside.data(), inside.data()), 0);
+            EXPECT_LE(relative_error(inside, *expected), bound(s.nfft * s.mfft + 1));
+            ASSERT_EQ(fft_c(s.n, s.nfft, s.m, s.mfft, dir_rows, dir_cols, in.data(), apart.data()), 0);
+            const bool skipped = (dir_rows == 0 || s.nfft == 1) && (dir_cols == 0 || s.mfft == 1);
+            for (int row = 0; row < s.m; ++row)
+                for (int k = 0; k < s.n; ++k) {
+                    const auto at = static_cast<std::size_t>(row * s.n + k);
+                    const bool taken = !skipped && row < s.mfft && k < s.nfft;
+                    ASSERT_EQ(apart[at], taken ? inside[at] : fcomplex{-999.0F}) << row << " " << k;
+                }
+        }
+    }
+}
+
+TEST_P(Fft, InverseDirectionsNormaliseAsTheirCodesSay) {
+    constexpr int n = 12, m = 10;
+    const Samples in = test::noise(n * m);
+    for (const auto& [rows, cols, factor] : {std::tuple{-1, 0, 1.0F},
+                                             {-2, 0, 12.0F},
+                                             {0, -1, 1.0F},
+                                             {0, -2, 10.0F},
+                                             {-1, -1, 1.0F},
+                                             {-2, -1, 12.0F},
+                                             {-1, -2, 10.0F},
+                                             {-2, -2, 120.0F}}) {
+        Samples work = in;
+        ASSERT_EQ(fft_c(n, n, m, m, rows != 0, cols != 0, work.data(), work.data()), 0);
+        ASSERT_EQ(fft_c(n, n, m, m, rows, cols, work.data(), work.data()), 0);
+        Samples expected = in;
+        for (fcomplex& sample : expected) sample *= factor;
+        EXPECT_LE(relative_error(work, expected), 5e-7) << rows << " " << cols;
+    }
+}
+
+TEST_P(Fft, ANormalisedInverseIsTheUnscaledOneTimesOneFactor) {
+    // Both axes normalised: 1 / nfft is divided by mfft before anything is multiplied.
+    constexpr int n = 9, m = 7;
+    const Samples in = test::noise(n * m);
+    Samples scaled(in.size()), plain(in.size());
+    ASSERT_EQ(fft_c(n, n, m, m, -1, -1, in.data(), scaled.data()), 0);
+    ASSERT_EQ(fft_c(n, n, m, m, -2, -2, in.data(), plain.data()), 0);
+    const float factor = 1.0F / 9.0F / 7.0F;
+    for (std::size_t k = 0; k < in.size(); ++k) {
+        EXPECT_EQ(scaled[k].real(), plain[k].real() * factor);
+        EXPECT_EQ(scaled[k].imag(), plain[k].imag() * factor);
+    }
+}
+
+TEST_P(Fft, IsLinearAndTurnsAShiftIntoARamp) {
+    constexpr int n = 60, shift = 7;
+    const Samples x = test::noise(n, 1), y = test::noise(n, 2);
+    const fcomplex a{1.7F, -0.3F};
+    Samples mixed(n), shifted(n), fx(n), fy(n), fmixed(n), fshifted(n);
+    for (std::size_t k = 0; k < n; ++k) mixed[k] = a * x[k] + y[k];
+    for (std::size_t k = 0; k < n; ++k) shifted[(k + shift) % n] = x[k];
+    for (const auto& [from, to] : {std::pair{&x, &fx}, {&y, &fy}, {&mixed, &fmixed}, {&shifted, &fshifted}})
+        ASSERT_EQ(fft_c(n, n, 1, 1, 1, 0, from->data(), to->data()), 0);
+    Samples sum(n), ramped(n);
+    for (std::size_t k = 0; k < n; ++k) sum[k] = a * fx[k] + fy[k];
+    for (std::size_t k = 0; k < n; ++k) ramped[k] = fx[k] * fcomplex{root(k * shift, n)};
+    EXPECT_LE(relative_error(fmixed, sum), 1e-6);
+    EXPECT_LE(relative_error(fshifted, ramped), 1e-6);
+}
+
+TEST_P(Fft, MeetsThePublishedVectors) {
+    for (const int n : {8, 16, 30, 64}) {
+        std::ifstream file{QUO_TEST_DATA "/fft/fft_" + std::to_string(n) + ".csv"};
+        Samples x;
+        Exact expected;
+        for (std::string line; std::getline(file, line);) {
+            std::istringstream fields{line};
+            char comma = 0;
+            double k = 0, a = 0, b = 0, c = 0, d = 0;
+            if (!(fields >> k >> comma >> a >> comma >> b >> comma >> c >> comma >> d)) continue;
+            x.emplace_back(static_cast<float>(a), static_cast<float>(b));
+            expected.emplace_back(c, d);
+        }
+        ASSERT_EQ(x.size(), static_cast<std::size_t>(n));
+        ASSERT_EQ(fft_c(n, n, 1, 1, 1, 0, x.data(), x.data()), 0);
+        EXPECT_LE(relative_error(x, expected), bound(n)) << n;
+    }
+}
+
+TEST_P(Fft, RunsSamplesThatStartBetweenTwoVectors) {
+    constexpr int n = 24, m = 5;
+    const Samples in = test::noise(n * m + 1);
+    Samples even(in.begin() + 1, in.end()), odd = in;
+    ASSERT_EQ(fft_c(n, n, m, m, 1, 1, even.data(), even.data()), 0);
+    ASSERT_EQ(fft_c(n, n, m, m, 1, 1, odd.data() + 1, odd.data() + 1), 0);
+    odd.erase(odd.begin());
+    EXPECT_LE(relative_error(odd, even), 5e-7);
+}
+
+// ---- Real data ----
+
+/** Real values along one axis of an image, their packed spectrum from the complex one, and back. */
+TEST_P(Fft, RealSpectraArePackedAndComeBack) {
+    for (const int length : {2, 3, 4, 5, 8, 15, 36, 45}) {
+        for (const bool rows : {true, false}) {
+            SCOPED_TRACE(testing::Message() << length << (rows ? " along rows" : " down columns"));
+            constexpr int other = 19, spare = 2;
+            const int n = (rows ? length : other) + spare, m = (rows ? other : length) + spare;
+            const int nfft = n - spare, mfft = m - spare;
+            std::vector<float> in;
+            for (const fcomplex& sample : test::noise(static_cast<std::size_t>(n * m)))
+                in.push_back(sample.real());
+            std::vector<float> packed(in.size(), -999.0F);
+            ASSERT_EQ(fft_r(n, nfft, m, mfft, rows ? 1 : 0, rows ? 0 : 1, in.data(), packed.data()), 0);
+            for (int t = 0; t < other; ++t) {
+                const auto at = [&](int k) { return static_cast<std::size_t>(rows ? t * n + k : k * n + t); };
+                Exact x, expected;
+                Samples got;
+                for (int k = 0; k < length; ++k) x.emplace_back(in[at(k)]);
+                x = transform(x);
+                for (int k = 0; k < length; ++k) {
+                    const dcomplex bin = x[static_cast<std::size_t>((k + 1) / 2)];
+                    expected.emplace_back(k % 2 == 1 || k == 0 ? bin.real() : bin.imag());
+                    got.emplace_back(packed[at(k)]);
+                }
+                ASSERT_LE(relative_error(got, expected), bound(length));
+            }
+            EXPECT_EQ(std::count(packed.begin(), packed.end(), -999.0F), n * m - nfft * mfft);
+            ASSERT_EQ(fft_r(n, nfft, m, mfft, rows ? -1 : 0, rows ? 0 : -1, packed.data(), packed.data()), 0);
+            for (int row = 0; row < mfft; ++row)
+                for (int k = 0; k < nfft; ++k) {
+                    const auto at = static_cast<std::size_t>(row * n + k);
+                    ASSERT_NEAR(packed[at], in[at], 2e-6F);
+                }
+        }
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Engines, Fft, testing::ValuesIn(test::kEngines),
+                         [](const auto& row) { return row.param.name; });
+
+// ---- Arguments and the life of plans ----
+
+struct Arguments {
+    const char* name;
+    int n, nfft, m, mfft, rows, cols, status;
+};
+constexpr Arguments kArguments[] = {
+    {"NoSamples", 0, 0, 4, 4, 1, 1, 1},
+    {"NegativeSamples", -8, 4, 4, 4, 1, 1, 1},
+    {"NoRows", 8, 8, 0, 0, 1, 1, 1},
+    {"NegativeRows", 8, 8, INT_MIN, 1, 1, 1, 1},
+    {"MoreThanAnAddressSpaceHolds", INT_MAX, 4, INT_MAX, 4, 1, 1, 1},
+    {"RowLengthAboveRow", 8, 9, 4, 4, 1, 0, 2},
+    {"NoRowLength", 8, 0, 4, 4, 1, 0, 2},
+    {"NegativeRowLength", 8, -3, 4, 4, 1, 0, 2},
+    {"ColumnLengthAboveRows", 8, 8, 4, 5, 0, 1, 3},
+    {"NegativeColumnLength", 8, 8, 4, -1, 0, 1, 3},
+    {"UnknownRowDirection", 8, 8, 4, 4, 2, 0, 4},
+    {"FarRowDirection", 8, 8, 4, 4, INT_MIN, 0, 4},
+    {"UnknownColumnDirection", 8, 8, 4, 4, 1, -3, 5},
+};
+class FftArguments : public testing::TestWithParam<Arguments> {
+    test::Engine engine_{"fftw"};
+};
+
+TEST_P(FftArguments, AreRefusedAndNothingIsWritten) {
+    const Arguments& a = GetParam();
+    FftPlan plan{nullptr, 41, 42, 43, 44, nullptr, 45, 46, 47, 48};
+    Samples data = test::noise(32);
+    const Samples before = data;
+    EXPECT_EQ(fft_makep_c(&plan, a.n, a.nfft, a.m, a.mfft, a.rows, a.cols, 1), a.status);
+    EXPECT_EQ(fft_makep_r(&plan, a.n, a.nfft, a.m, a.mfft, a.rows, a.cols, 1), a.status);
+    EXPECT_EQ(fft_c(a.n, a.nfft, a.m, a.mfft, a.rows, a.cols, data.data(), data.data()), a.status);
+    EXPECT_EQ(plan.rows, nullptr);
+    EXPECT_EQ(plan.n + plan.column_direction, 41 + 48);
+    EXPECT_EQ(data, before);
+}
+INSTANTIATE_TEST_SUITE_P(Table, FftArguments, testing::ValuesIn(kArguments),
+                         [](const auto& row) { return row.param.name; });
+
+class FftPlans : public testing::Test {
+protected:
+    test::Engine engine_{"fftw"};
+    Samples data_ = test::noise(64), before_ = data_;
+};
+
+TEST_F(FftPlans, WithoutDirectionsHoldNothingAndLeaveTheOutputAlone) {
+    FftPlan plan{};
+    ASSERT_EQ(fft_makep_c(&plan, 8, 8, 4, 4, 0, 0, 0), 0);
+    EXPECT_EQ(plan.rows, nullptr);
+    EXPECT_EQ(plan.columns, nullptr);
+    Samples out(64);
+    EXPECT_EQ(pfft_c(&plan, data_.data(), out.data()), 0);
+    EXPECT_EQ(out, Samples(64));
+    EXPECT_EQ(fft_destp_c(&plan), 0);
+}
+
+TEST_F(FftPlans, RecordWhatWasAskedFor) {
+    FftPlan plan{};
+    ASSERT_EQ(fft_makep_c(&plan, 8, 6, 4, 3, -1, -2, 1), 0);
+    EXPECT_NE(plan.rows, nullptr);
+    EXPECT_NE(plan.columns, nullptr);
+    EXPECT_EQ((std::vector{plan.n, plan.nfft, plan.m, plan.mfft}), (std::vector{8, 6, 4, 3}));
+    EXPECT_EQ(
+        (std::vector{plan.normalise_rows, plan.row_direction, plan.normalise_columns, plan.column_direction}),
+        (std::vector{1, -1, 0, -1}));
+    EXPECT_EQ(fft_destp_c(&plan), 0);
+    EXPECT_EQ(fft_makep_r(&plan, 8, 8, 4, 4, 1, 1, 1), 5) << "one axis per plan of real data";
+}
+
+TEST_F(FftPlans, ThatWereReleasedCopiedOrMadeUpAreRefused) {
+    FftPlan plan{};
+    ASSERT_EQ(fft_makep_c(&plan, 8, 8, 8, 8, 1, 1, 1), 0);
+    FftPlan copy = plan, longer = plan;
+    longer.nfft = 7;  // no longer what the handle stands for
+    EXPECT_EQ(pfft_c(&longer, data_.data(), data_.data()), 1);
+    EXPECT_EQ(fft_destp_c(&plan), 0);
+    EXPECT_EQ(fft_destp_c(&plan), 1);
+    FftPlan next{};
+    ASSERT_EQ(fft_makep_c(&next, 8, 8, 8, 8, 1, 1, 1), 0);  // must not revive the old handles
+    for (FftPlan* stale : {&plan, &copy}) EXPECT_EQ(pfft_c(stale, data_.data(), data_.data()), 1);
+    EXPECT_EQ(fft_destp_c(&copy), 1);
+    FftPlan made_up{reinterpret_cast<FftEnginePlan*>(&copy), 8, 8, 0, 1, nullptr, 8, 8, 0, 0};
+    EXPECT_EQ(pfft_c(&made_up, data_.data(), data_.data()), 1);
+    EXPECT_EQ(fft_destp_c(&made_up), 1);
+    EXPECT_EQ(pfft_c(nullptr, data_.data(), data_.data()), 1);
+    EXPECT_EQ(fft_destp_c(nullptr), 1);
+    EXPECT_EQ(data_, before_);
+    EXPECT_EQ(pfft_c(&next, data_.data(), data_.data()), 0);
+    EXPECT_EQ(fft_destp_c(&next), 0);
+}
+
+TEST_F(FftPlans, RefuseBuffersThatDoNotFitThem) {
+    FftPlan inside{}, apart{}, real{};
+    ASSERT_EQ(fft_makep_c(&inside, 8, 8, 4, 4, 1, 0, 1), 0);
+    ASSERT_EQ(fft_makep_c(&apart, 8, 8, 4, 4, 0, 1, 0), 0);
+    ASSERT_EQ(fft_makep_r(&real, 8, 8, 4, 4, 1, 0, 1), 0);
+    fcomplex* const data = data_.data();
+    EXPECT_EQ(pfft_c(&inside, data, data + 32), 1);
+    EXPECT_EQ(pfft_c(&inside, nullptr, nullptr), 1);
+    EXPECT_EQ(pfft_c(&apart, data, data), 1);
+    EXPECT_EQ(pfft_c(&apart, data, data + 31), 1);
+    EXPECT_EQ(pfft_c(&apart, data + 31, data), 1);
+    EXPECT_EQ(pfft_c(&apart, data, nullptr), 1);
+    EXPECT_EQ(pfft_c(&real, data, data), 1) << "made for real data";
+    EXPECT_EQ(pfft_r(&inside, reinterpret_cast<float*>(data), reinterpret_cast<float*>(data)), 1);
+    EXPECT_EQ(data_, before_);
+    EXPECT_EQ(pfft_c(&apart, data, data + 32), 0);
+    for (FftPlan* plan : {&inside, &apart, &real}) EXPECT_EQ(fft_destp_c(plan), 0);
+}
+
+// ---- Lengths and halves ----
+
+TEST(Genpow, FindsTheFirstSmoothLengthOfTheProgression) {
+    struct Row {
+        int n, step, length;
+    };
+    for (const Row& row : {Row{1000, 1, 1000},
+                           {1025, 1, 1080},
+                           {5625, 1, 5760},
+                           {1, 1, 1},
+                           {7, 1, 8},
+                           {7, 7, 0},
+                           {11, 4, 15},
+                           {0, 1, 0},
+                           {-3, 1, 0},
+                           {1000, 0, 1000},
+                           {1001, 0, 0},
+                           {1001, -1, 0},
+                           {5625, 0, 0},
+                           {INT_MAX, 1, 0},
+                           {2123366400, 1, 2123366400}}) {
+        EXPECT_EQ(genpow(row.n, row.step), row.length) << row.n << " " << row.step;
+    }
+}
+
+TEST(Genpow, AgreesWithTrialDivision) {
+    const auto smooth = [](int n) {
+        for (const int p : {2, 3, 5})
+            while (n % p == 0) n /= p;
+        return n == 1;
+    };
+    for (const int step : {1, 2, 3, 8, 17})
+        for (int n = 5400; n < 5800; n += 7) {
+            int expected = n;
+            while (!smooth(expected)) expected += step;
+            if (expected == 5625)
+                for (expected = 5626; !smooth(expected);) expected += step;
+            ASSERT_EQ(genpow(n, step), expected) << n << " " << step;
+        }
+}
+
+TEST(Fftshift, MovesSampleZeroToTheMiddleAndBack) {
+    const auto ramp = [](int n) {
+        Samples row;
+        for (int k = 0; k < n; ++k) row.emplace_back(static_cast<float>(k));
+        return row;
+    };
+    Samples four = ramp(4), five = ramp(5);
+    EXPECT_EQ(fftshift(four.data(), 4, 1), 2);
+    EXPECT_EQ(four, (Samples{2.0F, 3.0F, 0.0F, 1.0F}));
+    EXPECT_EQ(fftshift(five.data(), 5, 1), 2);
+    EXPECT_EQ(five, (Samples{3.0F, 4.0F, 0.0F, 1.0F, 2.0F}));
+    for (int n = 1; n < 10; ++n) {
+        Samples rows = ramp(3 * n);
+        EXPECT_EQ(fftshift(rows.data(), n, 3), n / 2);
+        EXPECT_EQ(rows[static_cast<std::size_t>(n + n / 2)], fcomplex{static_cast<float>(n)});
+        EXPECT_EQ(ifftshift(rows.data(), n, 3), n / 2);
+        EXPECT_EQ(rows, ramp(3 * n));
+    }
+    EXPECT_EQ(fftshift(nullptr, 4, 1), 2);
+    EXPECT_EQ(fftshift(four.data(), 0, 1), 0);
+    EXPECT_EQ(ifftshift(four.data(), -4, 1), 0);
+    EXPECT_EQ(ifftshift(four.data(), 4, -1), 2);
+}
+
+TEST(FftMalloc, GivesAlignedBlocksAndRefusesWhatCannotBe) {
+    for (const std::size_t bytes : {0, 1, 17, 4096, 1000003}) {
+        auto* block = static_cast<unsigned char*>(fft_malloc(bytes));
+        ASSERT_NE(block, nullptr);
+        EXPECT_EQ(reinterpret_cast<std::uintptr_t>(block) % 16, 0U);
+        std::fill_n(block, bytes, static_cast<unsigned char>(0xA5));  // the sanitizer looks at the ends
+        fft_free(block);
+    }
+    auto* zeros = static_cast<unsigned char*>(fft_calloc(37, 27));
+    ASSERT_NE(zeros, nullptr);
+    EXPECT_EQ(std::count(zeros, zeros + 37 * 27, 0), 37 * 27);
+    fft_free(zeros);
+    fft_free(nullptr);
+    EXPECT_EQ(fft_malloc(SIZE_MAX - 3), nullptr);
+    EXPECT_EQ(fft_calloc(SIZE_MAX / 2, 3), nullptr);
+    errno = 0;
+}
+
+}  // namespace
