@@ -9,6 +9,7 @@
 #include <cstddef>
 #include <cstdlib>
 #include <cstring>
+#include <limits>
 #include <random>
 #include <vector>
 
@@ -24,27 +25,20 @@ double seconds_of(auto work) {
     return std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
 }
 
-double median(std::vector<double> values) {
-    const auto middle = values.begin() + static_cast<std::ptrdiff_t>(values.size() / 2);
-    std::nth_element(values.begin(), middle, values.end());
-    return *middle;
-}
-
-/** Runs floor and subject in turn, so that both meet the same machine, and shows the medians of `steps` each in
- * ns. */
+/** Runs floor and subject in turn, so that both meet the same machine, and shows the shortest of each in ns per
+ * step: what disturbs a run only ever makes it longer. */
 void in_turn(benchmark::State& state, double steps, auto floor, auto subject) {
-    std::vector<double> floor_ns, subject_ns;
+    double floor_s = std::numeric_limits<double>::infinity(), subject_s = floor_s;
     for ([[maybe_unused]] auto _ : state) {
-        floor_ns.push_back(floor() / steps * 1e9);
+        floor_s = std::min(floor_s, floor());
         const double seconds = subject();
-        subject_ns.push_back(seconds / steps * 1e9);
+        subject_s = std::min(subject_s, seconds);
         state.SetIterationTime(seconds);
     }
-    const double below = median(floor_ns), above = median(subject_ns);
-    state.counters["floor_ns"] = below;
-    state.counters["ns"] = above;
-    state.counters["extra_ns"] = above - below;
-    state.counters["ratio"] = above / below;
+    state.counters["floor_ns"] = floor_s / steps * 1e9;
+    state.counters["ns"] = subject_s / steps * 1e9;
+    state.counters["extra_ns"] = (subject_s - floor_s) / steps * 1e9;
+    state.counters["ratio"] = subject_s / floor_s;
 }
 
 // ---- Frames
