@@ -2,7 +2,9 @@
 #include <libxml/parser.h>
 #include <libxml/tree.h>
 
+#include <iterator>
 #include <memory>
+#include <random>
 #include <string>
 #include <vector>
 
@@ -118,5 +120,42 @@ INSTANTIATE_TEST_SUITE_P(Documents, SavedBytes,
                          [](const auto& row) {
                              return std::string{std::get<0>(row.param).name} + std::get<1>(row.param).name;
                          });
+
+/** Content of an element: blanks, texts, comments, elements that the edits know and others, in any order. */
+std::string random_content(std::mt19937& random, int depth) {
+    constexpr const char* kLeaves[] = {
+        " ",     "\n  ",      "text",  " 1, 2 ", "<!-- c -->", "<?p i?>", "<![CDATA[ x ]]>", "<![CDATA[]]>",
+        "&#32;", "&lt;&amp;", "&#13;", "<e/>",   "<e></e>",    "<e> </e>"};
+    constexpr const char* kNames[] = {"Sec", "Arr", "one", "texts", "Blank", "List", "b"};
+    std::string content;
+    for (auto pieces = random() % 5; pieces > 0; --pieces) {
+        if (depth == 0 || random() % 2 == 0) {
+            content += kLeaves[random() % std::size(kLeaves)];
+            continue;
+        }
+        const std::string name = kNames[random() % std::size(kNames)];
+        const char* const attribute = random() % 8 == 0 ? " xml:space=\"preserve\"" : "";
+        content += "<" + name + attribute + ">" + random_content(random, depth - 1) + "</" + name + ">";
+    }
+    return content;
+}
+
+TEST(SavedBytesOfAnyDocument, AreThoseOfSavingTwice) {
+    const test::TemporaryFolder folder;
+    const std::string file = folder.file("header.xml"), literal = folder.file("literal.xml");
+    std::mt19937 random{20120717};
+    for (int round = 0; round < 150; ++round) {
+        const std::string text = header_text("<S/><x:S xmlns:x=\"urn:x\"/>" + random_content(random, 5));
+        SCOPED_TRACE(text);
+        write_text(file, text);
+        OpenDocument document{file.c_str()};
+        ASSERT_TRUE(document.fieldExists(1, "S"));
+        kEdits[random() % std::size(kEdits)].apply(document);
+        const std::string expected = saved_twice(static_cast<xmlNode*>(document.getNode(1, ""))->doc, literal);
+        EXPECT_EQ(document.write(), 0);
+        ASSERT_EQ(read_text(file), expected);
+        EXPECT_EQ(document.write(), 0) << "the document in memory is still whole";
+    }
+}
 
 }  // namespace

@@ -10,6 +10,8 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstring>
+#include <new>
+#include <utility>
 
 #include "quo_base/api.h"
 #include "sarutillib/file_io.h"
@@ -86,6 +88,22 @@ std::unique_ptr<xmlParserCtxt, decltype(&xmlFreeParserCtxt)> make_parser() {
     return {parser, &xmlFreeParserCtxt};
 }
 
+constexpr int kOptions = XML_PARSE_NOBLANKS | XML_PARSE_COMPACT | XML_PARSE_NONET;
+
+/** Parses with `read(parser)`. 0, 1 for what is no XML that we accept, or 7. */
+template <typename Read>
+int parse(XmlTree& tree, Read read) {
+    const XmlErrors errors;
+    const auto parser = make_parser();
+    if (!parser) return QUO_NO_MEMORY;
+    tree.reset(read(parser.get()));
+    // A text that is too long counts as a lack of memory too; what fails without an error never got to parse.
+    const bool unexplained = !tree && parser->errNo == XML_ERR_OK;
+    if (errors.out_of_memory() || unexplained) return QUO_NO_MEMORY;
+    // A parser that was stopped hands over the part that it has and calls it well-formed.
+    return tree && !parser->disableSAX ? QUO_OK : QUO_REFUSED;
+}
+
 int open_source(const char* file, Source& source) {
     source.file = Descriptor{::open(file, O_RDONLY | O_CLOEXEC)};
     if (!source.file) return errno == ENOMEM ? QUO_NO_MEMORY : QUO_REFUSED;
@@ -99,24 +117,19 @@ int open_source(const char* file, Source& source) {
 int HeaderDocument::load(const char* file, std::shared_ptr<HeaderDocument>& document) {
     Source source;
     if (const int status = open_source(file, source)) return status;
-    const XmlErrors errors;
-    const auto parser = make_parser();
-    if (!parser) return QUO_NO_MEMORY;
-    constexpr int kOptions = XML_PARSE_NOBLANKS | XML_PARSE_COMPACT | XML_PARSE_NONET;
-    std::unique_ptr<xmlDoc, FreeXml> tree{
-        xmlCtxtReadIO(parser.get(), read_source, nullptr, &source, nullptr, nullptr, kOptions)};
-    // A text that is too long counts as a lack of memory too; what fails without an error never got to parse.
-    const bool unexplained = !tree && parser->errNo == XML_ERR_OK;
-    if (source.too_long || errors.out_of_memory() || unexplained) return QUO_NO_MEMORY;
-    // A parser that was stopped hands over the part that it has and calls it well-formed.
-    if (!tree || parser->disableSAX) return QUO_REFUSED;
+    XmlTree tree;
+    const int status = parse(tree, [&](xmlParserCtxt* parser) {
+        return xmlCtxtReadIO(parser, read_source, nullptr, &source, nullptr, nullptr, kOptions);
+    });
+    if (source.too_long) return QUO_NO_MEMORY;
+    if (status != QUO_OK) return status;
     document = std::make_shared<HeaderDocument>(tree.get(), source.bytes);
     (void)tree.release();
     return QUO_OK;
 }
 
 std::shared_ptr<HeaderDocument> HeaderDocument::create() {
-    std::unique_ptr<xmlDoc, FreeXml> tree{xmlNewDoc(xml("1.0"))};
+    XmlTree tree{xmlNewDoc(xml("1.0"))};
     xmlNode* root = tree ? xmlNewDocNode(tree.get(), nullptr, xml(kRoot), nullptr) : nullptr;
     if (!root) return nullptr;
     xmlDocSetRootElement(tree.get(), root);
@@ -165,12 +178,46 @@ int write_sink(void* context, const char* bytes, int length) {
     return static_cast<Sink*>(context)->take({bytes, static_cast<std::size_t>(length)}) ? length : -1;
 }
 
+/** Whether a text stands beside anything else in an element. */
+bool has_mixed_content(const xmlNode* parent) {
+    for (const xmlNode* node = parent->children; node; node = node->next) {
+        const bool element = node->type == XML_ELEMENT_NODE;
+        const bool text = !element && node->type != XML_COMMENT_NODE && node->type != XML_PI_NODE;
+        if (text && (node->prev || node->next)) return true;
+        if (element && has_mixed_content(node)) return true;
+    }
+    return false;
+}
+
+/** The tree as it comes back from a file; null when it does not. */
+XmlTree reloaded(xmlDoc* tree) {
+    xmlChar* text = nullptr;
+    int size = 0;
+    xmlDocDumpFormatMemoryEnc(tree, &text, &size, "UTF-8", 1);
+    const std::unique_ptr<xmlChar, FreeXml> owned{text};
+    XmlTree again;
+    const int status = parse(again, [&](xmlParserCtxt* parser) -> xmlDoc* {
+        return text ? xmlCtxtReadMemory(parser, reinterpret_cast<const char*>(text), size, nullptr, nullptr,
+                                        kOptions)
+                    : nullptr;
+    });
+    return status == QUO_OK ? std::move(again) : nullptr;
+}
+
 }  // namespace
 
-bool HeaderDocument::save(const char* file) const {
+bool HeaderDocument::save(const char* file) {
+    const XmlErrors errors;
     Sink sink{file};
     if (!sink.good()) return false;
-    const XmlErrors errors;
+    // Saving, loading without blank text nodes and saving again is the documented way. It changes nothing unless
+    // there are texts beside elements: some of the blanks among them are dropped by loading.
+    const xmlNode* top = xmlDocGetRootElement(tree_.get());
+    if (top && has_mixed_content(top)) {
+        XmlTree again = reloaded(tree_.get());
+        if (!again) return false;
+        tree_ = std::move(again);
+    }
     // Without an encoder the text, which is UTF-8 in memory, is written as it stands: the bytes are those of
     // xmlSaveFormatFileEnc.
     xmlOutputBuffer* output = xmlOutputBufferCreateIO(write_sink, nullptr, &sink, nullptr);
@@ -199,6 +246,11 @@ bool is_named(const xmlNode* node, std::string_view name) noexcept {
 }
 
 namespace {
+
+void unlink(xmlNode* node) noexcept {
+    xmlUnlinkNode(node);
+    xmlFreeNode(node);
+}
 
 /** Value of an attribute, empty when there is none. It is one piece of text: entities are not declared here. */
 std::string_view attribute(const xmlNode* node, const char* name) {
@@ -258,18 +310,78 @@ bool HeaderDocument::can_hold(std::int64_t count) const noexcept {
     return source_bytes_ < 0 || count <= source_bytes_ / 2 + written_values_;
 }
 
+// --- the index of names -----------------------------------------------------------------------------------------
+
+const std::vector<xmlNode*>* NameIndex::find(std::string_view name) const noexcept {
+    const auto found = children_.find(name);
+    return found == children_.end() ? nullptr : &found->second;
+}
+
+void NameIndex::add(xmlNode* child) {
+    if (child->type != XML_ELEMENT_NODE || child->ns) return;
+    children_[reinterpret_cast<const char*>(child->name)].push_back(child);
+}
+
+bool NameIndex::forget(const xmlNode* child) noexcept {
+    if (child->type != XML_ELEMENT_NODE || child->ns) return true;
+    const auto found = children_.find(reinterpret_cast<const char*>(child->name));
+    if (found == children_.end()) return false;
+    // With several of the name the search for one would cost, and the name itself may be the child's own.
+    if (found->second.size() > 1) return false;
+    children_.erase(found);
+    return true;
+}
+
+const NameIndex* HeaderDocument::index_of(const xmlNode* parent) const noexcept {
+    if (indices_.empty()) return nullptr;
+    const auto found = indices_.find(parent);
+    return found == indices_.end() ? nullptr : &found->second;
+}
+
+void HeaderDocument::note_walk(xmlNode* parent, std::int64_t passed) const noexcept {
+    constexpr std::int64_t kLongWalk = 64, kMostInVain = 4096;
+    passed_in_vain_ += passed;
+    if (passed < kLongWalk || passed_in_vain_ < kMostInVain) return;
+    try {
+        const auto [index, made] = indices_.try_emplace(parent);
+        for (xmlNode* child = parent->children; made && child; child = child->next) index->second.add(child);
+    } catch (const std::bad_alloc&) {
+        indices_.erase(parent);  // the children are walked as before
+    }
+}
+
+void HeaderDocument::note_appended(const xmlNode* parent, xmlNode* node) noexcept {
+    const auto index = indices_.find(parent);
+    if (index == indices_.end()) return;
+    try {
+        index->second.add(node);
+    } catch (const std::bad_alloc&) {
+        indices_.erase(index);
+    }
+}
+
+/** Forgets the indices of an element that goes, and of all below it. */
+void HeaderDocument::forget_indices(const xmlNode* node) noexcept {
+    if (indices_.empty() || node->type != XML_ELEMENT_NODE) return;
+    indices_.erase(node);
+    for (const xmlNode* child = node->children; child; child = child->next) forget_indices(child);
+}
+
 // --- changing ---------------------------------------------------------------------------------------------------
 
 xmlNode* HeaderDocument::append(xmlNode* parent, std::string_view name) {
     // Blanks that were the whole text of an element would keep its new children from being indented.
     if (parent->children && parent->children == parent->last && xmlIsBlankNode(parent->children))
-        remove(parent->children);
+        unlink(parent->children);
     // No content, rather than an empty one: an empty text node would be written as <a></a> and stop the
     // indentation.
     xmlNode* node = xmlNewChild(parent, nullptr, xml(std::string{name}.c_str()), nullptr);
-    if (!node || node->name) return node;
-    remove(node);  // made while memory ran out
-    return nullptr;
+    if (node && !node->name) {  // made while memory ran out
+        unlink(node);
+        return nullptr;
+    }
+    if (node) note_appended(parent, node);
+    return node;
 }
 
 xmlNode* HeaderDocument::append_channel(int channel) {
@@ -298,6 +410,8 @@ bool HeaderDocument::set_text(xmlNode* node, std::string_view text) {
             return false;
         }
     }
+    for (const xmlNode* child = node->children; child; child = child->next) forget_indices(child);
+    indices_.erase(node);
     xmlFreeNodeList(node->children);
     node->children = node->last = nullptr;
     if (content) xmlAddChild(node, content);
@@ -316,9 +430,11 @@ bool HeaderDocument::insert_instruction(const char* name, const char* content) {
     return true;
 }
 
-void remove(xmlNode* node) noexcept {
-    xmlUnlinkNode(node);
-    xmlFreeNode(node);
+void HeaderDocument::remove(xmlNode* node) noexcept {
+    forget_indices(node);
+    const auto index = indices_.find(node->parent);
+    if (index != indices_.end() && !index->second.forget(node)) indices_.erase(index);
+    unlink(node);
 }
 
 bool set_attribute(xmlNode* node, const char* name, const char* value) noexcept {

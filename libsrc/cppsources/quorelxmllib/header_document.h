@@ -3,10 +3,12 @@
 
 #include <libxml/tree.h>
 
+#include <algorithm>
 #include <cstdint>
 #include <memory>
 #include <string>
 #include <string_view>
+#include <unordered_map>
 #include <vector>
 
 namespace quo {
@@ -15,6 +17,8 @@ struct FreeXml {
     void operator()(xmlDoc* tree) const noexcept { xmlFreeDoc(tree); }
     void operator()(xmlChar* text) const noexcept { xmlFree(text); }
 };
+
+using XmlTree = std::unique_ptr<xmlDoc, FreeXml>;
 
 /** Text of an element: in place where it is one piece, else a copy. */
 class NodeText {
@@ -32,6 +36,19 @@ private:
 /** Whether a node is an element with this name, in no namespace. */
 bool is_named(const xmlNode* node, std::string_view name) noexcept;
 
+/** The child elements of a parent by name, in document order. */
+class NameIndex {
+public:
+    /** The children that bear the name, or null. */
+    [[nodiscard]] const std::vector<xmlNode*>* find(std::string_view name) const noexcept;
+    void add(xmlNode* child);
+    /** Forgets a child that goes; false when the index cannot do that at once. */
+    bool forget(const xmlNode* child) noexcept;
+
+private:
+    std::unordered_map<std::string_view, std::vector<xmlNode*>> children_;  // the names are the nodes' own
+};
+
 /** One header document: the tree, and the look-ups and changes that the field layout needs. Paths are walked name
  * by name and compared as data: nothing in them is an expression. */
 class HeaderDocument {
@@ -44,8 +61,9 @@ public:
 
     HeaderDocument(xmlDoc* tree, std::int64_t source_bytes) noexcept : tree_{tree}, source_bytes_{source_bytes} {}
 
-    /** Saves the tree, indented and in UTF-8, replacing the file in one step. On failure errno may tell why. */
-    [[nodiscard]] bool save(const char* file) const;
+    /** Saves the tree, indented and in UTF-8, replacing the file in one step. Nodes found before are not valid
+     * afterwards. On failure errno may tell why. */
+    [[nodiscard]] bool save(const char* file);
 
     /** Whether both `NumberOfChannels` and `Description` stand below the root `QuorelXmlDoc`. */
     [[nodiscard]] bool is_header() const noexcept { return find("NumberOfChannels") && find("Description"); }
@@ -71,6 +89,8 @@ public:
     xmlNode* append(xmlNode* parent, std::string_view name);
     /** Replaces the content of an element by a text. False when memory is short. */
     bool set_text(xmlNode* node, std::string_view text);
+    /** Removes an element with all it holds. */
+    void remove(xmlNode* node) noexcept;
     /** Inserts a processing instruction before the root element, unless something stands there already. */
     bool insert_instruction(const char* name, const char* content);
 
@@ -81,28 +101,46 @@ public:
 
 private:
     template <typename See>
-    static bool visit_below(xmlNode* parent, std::string_view path, See& see) {
+    bool visit_below(xmlNode* parent, std::string_view path, See& see) const {
         if (path.empty()) return see(parent);
         const auto slash = path.find('/');
         const std::string_view name = path.substr(0, slash);
         const bool last = slash == std::string_view::npos;
         const std::string_view rest = last ? std::string_view{} : path.substr(slash + 1);
         if (!last && rest.empty()) return true;  // a path that ends with a slash leads nowhere
-        for (xmlNode* node = parent->children; node; node = node->next)
-            if (is_named(node, name) && !(last ? see(node) : visit_below(node, rest, see))) return false;
-        return true;
+        const auto go_on = [&](xmlNode* node) { return last ? see(node) : visit_below(node, rest, see); };
+        if (const NameIndex* index = index_of(parent)) {
+            const std::vector<xmlNode*>* named = index->find(name);
+            return !named || std::ranges::all_of(*named, go_on);
+        }
+        std::int64_t passed = 0;
+        xmlNode* node = parent->children;
+        for (; node; node = node->next) {
+            if (!is_named(node, name))
+                ++passed;
+            else if (!go_on(node))
+                break;
+        }
+        note_walk(parent, passed);
+        return node == nullptr;
     }
+    [[nodiscard]] const NameIndex* index_of(const xmlNode* parent) const noexcept;
+    void note_walk(xmlNode* parent, std::int64_t passed) const noexcept;
+    void note_appended(const xmlNode* parent, xmlNode* node) noexcept;
+    void forget_indices(const xmlNode* node) noexcept;
     [[nodiscard]] xmlNode* root() const noexcept;
     [[nodiscard]] xmlNode* first_channel(int channel) const noexcept;
     [[nodiscard]] static xmlNode* next_channel(xmlNode* node, int channel) noexcept;
 
-    std::unique_ptr<xmlDoc, FreeXml> tree_;
+    XmlTree tree_;
     std::int64_t source_bytes_;  // -1: made in memory
     std::int64_t written_values_ = 0;
+    // Look-ups walk the children of each parent, until so many have been passed in vain that an index of a parent
+    // with many children pays: without one, n polynomials would take n * n steps.
+    mutable std::unordered_map<const xmlNode*, NameIndex> indices_;
+    mutable std::int64_t passed_in_vain_ = 0;
 };
 
-/** Removes an element with all it holds. */
-void remove(xmlNode* node) noexcept;
 /** Gives an element an attribute with a text, replacing an older one. False when memory is short. */
 bool set_attribute(xmlNode* node, const char* name, const char* value) noexcept;
 

@@ -187,8 +187,6 @@ int quorelxml::flush() noexcept {
 
 int quorelxml::write() noexcept {
     CallFrame frame{"quorelxml::write", kSource};
-    // The tree never holds blank or empty text nodes that would keep an element from being indented, so that one
-    // save gives the bytes that saving, loading without blanks and saving again would give.
     const int status = flush();
     return status ? frame.callee(status) : frame.success();
 }
@@ -332,7 +330,7 @@ int quorelxml::clearField(int channel, const char* field) noexcept {
         if (!document_) return frame.success();
         // The elements of one path never lie inside one another, so all can be found before the first goes.
         constexpr auto kAll = std::numeric_limits<std::size_t>::max();
-        for (xmlNode* node : document_->all(channel, quo::text_or_empty(field), kAll)) quo::remove(node);
+        for (xmlNode* node : document_->all(channel, quo::text_or_empty(field), kAll)) document_->remove(node);
         return frame.success();
     });
 }

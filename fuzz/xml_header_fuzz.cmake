@@ -1,0 +1,1 @@
+quo_fuzz(xml_header SOURCES xml_header_fuzz.cpp COMPONENTS quorelxml)

@@ -1,0 +1,96 @@
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <random>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "header_files.h"
+
+namespace {
+
+/** The children of the section "Set": names and numbers in the order of the file. */
+using Model = std::vector<std::pair<std::string, int>>;
+
+int count_of(const Model& model, const std::string& name) {
+    return static_cast<int>(std::ranges::count(model, name, &Model::value_type::first));
+}
+int first_of(const Model& model, const std::string& name) {
+    const auto found = std::ranges::find(model, name, &Model::value_type::first);
+    return found == model.end() ? -1 : found->second;
+}
+
+class ManyChildren : public testing::TestWithParam<unsigned> {
+protected:
+    // Enough children and look-ups in vain that the document answers from its index.
+    static constexpr int kNames = 300, kSteps = 4000;
+
+    std::string any_name() { return "child" + std::to_string(random_() % kNames); }
+    static std::string path(const std::string& name) { return "Set/" + name; }
+
+    void write_one() {
+        const std::string name = any_name();
+        const std::int32_t value = static_cast<std::int32_t>(random_() % 1000000);
+        ASSERT_EQ(document_.writeInt(1, path(name).c_str(), &value, 1), 0);
+        const auto found = std::ranges::find(model_, name, &Model::value_type::first);
+        if (found == model_.end())
+            model_.emplace_back(name, value);
+        else
+            found->second = value;
+    }
+    void append_copies() {
+        const std::string name = any_name();
+        const int wanted = count_of(model_, name) + 2;
+        ASSERT_EQ(document_.createField(1, path(name).c_str(), wanted), 0);
+        for (int present = count_of(model_, name); present < wanted; ++present) model_.emplace_back(name, 0);
+    }
+    void clear_one() {
+        const std::string name = any_name();
+        ASSERT_EQ(document_.clearField(1, path(name).c_str()), 0);
+        std::erase_if(model_, [&](const auto& child) { return child.first == name; });
+    }
+    void clear_all() {
+        ASSERT_EQ(document_.clearField(1, "Set"), 0);
+        model_.clear();
+    }
+    // An element with children of its own becomes one with a text: what was below it is gone.
+    void replace_by_text() {
+        const char* text = "nothing";
+        ASSERT_EQ(document_.writeString(1, "Set", &text, 1), 0);
+        model_.clear();
+        clear_all();
+    }
+    void look_up() {
+        const std::string name = any_name();
+        std::int32_t value = -1;
+        EXPECT_EQ(document_.readInt(1, path(name).c_str(), &value, 1), count_of(model_, name) > 0 ? 0 : 1);
+        EXPECT_EQ(value, first_of(model_, name)) << name;
+        EXPECT_EQ(document_.countNodes(1, path(name).c_str()), count_of(model_, name)) << name;
+    }
+
+    std::mt19937 random_{GetParam()};
+    test::OpenDocument document_{""};
+    Model model_;
+};
+
+TEST_P(ManyChildren, AreFoundWhateverCameAndWent) {
+    for (int step = 0; step < kSteps; ++step) {
+        const auto choice = random_() % 1000;
+        if (choice < 300)
+            write_one();
+        else if (choice < 340)
+            append_copies();
+        else if (choice < 440)
+            clear_one();
+        else if (choice < 442)
+            clear_all();
+        else if (choice < 443)
+            replace_by_text();
+        look_up();
+        ASSERT_FALSE(HasFailure()) << "step " << step;
+    }
+}
+INSTANTIATE_TEST_SUITE_P(Seeds, ManyChildren, testing::Range(1U, 6U));
+
+}  // namespace
