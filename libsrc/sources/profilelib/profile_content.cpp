@@ -144,7 +144,7 @@ ProfileContent::SectionPlace ProfileContent::add_section(std::string_view name) 
 
 const char* ProfileContent::add_key(SectionPlace section, std::string_view name, std::string_view value) {
     std::list<Key>& keys = section->keys;
-    const KeyPlace key = keys.insert(keys.end(), Key{std::string{name}, std::string{value}, section, {}});
+    const KeyPlace key = keys.insert(keys.end(), Key{section, std::string{name}, std::string{value}, {}});
     if (KeySlot* const slot = find_key(section->name, name))
         key->hidden = std::exchange(slot->place, key);
     else

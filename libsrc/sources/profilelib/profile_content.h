@@ -45,8 +45,8 @@ private:
     using KeyPlace = std::list<Key>::iterator;
 
     struct Key {
+        SectionPlace section;  // first, so that what a search compares lies close together
         std::string name, value;
-        SectionPlace section;
         std::optional<KeyPlace> hidden;  // the key that a search would find if this one were not there
     };
     struct Section {
