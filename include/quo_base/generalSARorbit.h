@@ -293,13 +293,11 @@ public:
      * @return 0; 1 for null; or the status of SVGetLatLon() or SVGetAngles() */
     int SVGetGeoCoords(geoCoords_Obj* grid, const GSRoi_Obj* roi) noexcept;
 
-    // --- polynomials derived from the orbit ------------------------------------------------------
-    //
-    // Least-squares fits of the geometry
-    // over a region's fast and slow start and length. `dc` tells the Doppler of every sample. 1 for a region or
-    // Doppler that is null, 10 for a fit that does not give finite numbers, else the status of the sampled
-    // geometry, of polfit() or of lfitd(). An output that is null is skipped; all outputs are unchanged on
-    // failure.
+    // --- polynomials derived from the orbit ---
+    // Least-squares fits of the geometry over a region's fast and slow start and length. `dc` tells the Doppler of
+    // every sample. 1 for a region or Doppler that is null, 10 for a fit that does not give finite numbers, else
+    // the status of the sampled geometry, of polfit() or of lfitd(). An output that is null is skipped; all
+    // outputs are unchanged on failure.
     //
     // The forms in range alone sample the middle of the region's azimuth times: 10 range times from the start to
     // start + length (50 in _v2), a parabola through them in c0, c1 and c4, the others 0, taz0 = 0. Its value is
@@ -309,13 +307,13 @@ public:
     // The forms in both times sample 100 range times by 50 azimuth times, both ends included, and fit all seven
     // coefficients; trg0 is the region's fast start, taz0 its slow start. 10 where a length is 0.
     //
-    // How far the parabolas and the forms in both times stay from the geometry at zero Doppler, anywhere in the
-    // region, at the middle azimuth time for parabolas:
+    // How far parabolas / forms in both times stay from the geometry at zero Doppler within their region,
+    // parabolas at the middle azimuth time (gr2sl's range times as slant ranges):
     //
-    //  platform height, slant range length          FM rate       angles            ground range   slant range
-    //  700 km, 53 km at 31 degrees incidence        @FR1
-    //  700 km, 157 km at 31 to 46 degrees           @FR2
-    //  12.5 km, 1.6 km at 21 to 34 degrees          @FR3
+    //  height, slant range, incidence         FM rate        angles             sl2gr         gr2sl
+    //  700 km, 53 km, 31 to 37 degrees        0.04 Hz/s      0.008 / 0.0006 deg   80 / 5 m    12 / 0.7 m
+    //  700 km, 157 km, 31 to 46 degrees       0.8 Hz/s       0.1 / 0.005 deg     900 / 40 m   200 / 1.5 m
+    //  12.5 km, 1.6 km, 21 to 37 degrees      0.0025 Hz/s    0.13 / 0.009 deg     27 / 2 m    1.8 / 0.007 m
 
     /** Azimuth FM rate, Hz/s. */
     int SVGetFRpoly(const ROI_Obj* roi, const polyDC* dc, polyFR* fr) noexcept;
@@ -333,8 +331,7 @@ public:
      *
      * gr2sl takes the ground range in place of the range time after trg0: EvaluatePoly(trg0 + ground range, any
      * azimuth time) is the range time after trg0, s. */
-    int SVGetGroundToSlantPolys(const ROI_Obj* roi, const polyDC* dc, polySL2GR* sl2gr,
-                                polyGR2SL* gr2sl) noexcept;
+    int SVGetGroundToSlantPolys(const ROI_Obj* roi, const polyDC* dc, polySL2GR* sl2gr, polyGR2SL* gr2sl) noexcept;
     /** The same in both times, every azimuth time's ground range beginning at trg0. gr2sl reaches as far as the
      * shortest of the azimuth times' ground ranges. */
     int SVGetGroundToTimePolys(const ROI_Obj* roi, const polyDC* dc, polySL2GR* sl2gr, polyGR2SL* gr2sl) noexcept;
