@@ -68,7 +68,7 @@ void count_keys(benchmark::State& state) {
 
 void load(benchmark::State& state) {
     const File& f = file(state);
-    for (auto _ : state) {
+    while (state.KeepRunning()) {
         FreeProfile(f.path());
         benchmark::DoNotOptimize(GetSetProfileChar(0, "Section0", "Parameter0", nullptr, f.path()));
     }
@@ -77,7 +77,7 @@ void load(benchmark::State& state) {
 
 void look_up(benchmark::State& state) {
     const File& f = file(state);
-    for (auto _ : state)
+    while (state.KeepRunning())
         for (const auto& [section, key] : f.order())
             benchmark::DoNotOptimize(GetSetProfileChar(0, section.c_str(), key.c_str(), nullptr, f.path()));
     count_keys(state);
@@ -99,7 +99,7 @@ std::vector<std::pair<std::string, std::string>> copy_lines(const char* path) {
 
 void copied_lines(benchmark::State& state) {
     const File& f = file(state);
-    for (auto _ : state) benchmark::DoNotOptimize(copy_lines(f.path()));
+    while (state.KeepRunning()) benchmark::DoNotOptimize(copy_lines(f.path()));
     count_keys(state);
 }
 
@@ -107,7 +107,7 @@ void hash_table(benchmark::State& state) {
     const File& f = file(state);
     const auto lines = copy_lines(f.path());
     const std::unordered_map<std::string, std::string> table{lines.begin(), lines.end()};
-    for (auto _ : state)
+    while (state.KeepRunning())
         for (const auto& [section, key] : f.order()) benchmark::DoNotOptimize(table.find(key));
     count_keys(state);
 }
