@@ -14,10 +14,13 @@ void add_geolocate(CLI::App& app, Job& job);
 void add_orbit(CLI::App& app, Job& job);
 void add_time(CLI::App& app, Job& job);
 void add_tiepoints(CLI::App& app, Job& job);
+void add_info(CLI::App& app, Job& job);
+void add_validate(CLI::App& app, Job& job);
 void add_get(CLI::App& app, Job& job);
 void add_set(CLI::App& app, Job& job);
 void add_convert(CLI::App& app, Job& job);
 void add_quicklook(CLI::App& app, Job& job);
+void add_footprint(CLI::App& app, Job& job);
 void add_vrt(CLI::App& app, Job& job);
 
 }  // namespace tool

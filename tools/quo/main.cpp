@@ -23,10 +23,13 @@ int run(int argc, char** argv) {
     tool::add_orbit(app, job);
     tool::add_time(app, job);
     tool::add_tiepoints(app, job);
+    tool::add_info(app, job);
+    tool::add_validate(app, job);
     tool::add_get(app, job);
     tool::add_set(app, job);
     tool::add_convert(app, job);
     tool::add_quicklook(app, job);
+    tool::add_footprint(app, job);
     tool::add_vrt(app, job);
     try {
         app.parse(argc, argv);

@@ -1,0 +1,273 @@
+#include <cmath>
+#include <filesystem>
+#include <memory>
+#include <nlohmann/json.hpp>
+#include <vector>
+
+#include "commands.h"
+#include "failure.h"
+#include "number.h"
+#include "output.h"
+#include "product.h"
+#include "raster.h"
+
+namespace tool {
+namespace {
+
+constexpr double kLightSpeed = 299792458.0;
+// What a satellite or an aircraft can do.
+constexpr double kSlowest_m_s = 20.0, kFastest_m_s = 12000.0;
+constexpr double kLowestRadius_m = 6.33e6, kHighestRadius_m = 6e7;
+constexpr double kUnknown = -900.0;  // numbers below are marks of missing values
+
+struct Finding {
+    bool error;
+    std::string object, field, reason;
+};
+
+/** Looks at a product from all sides and lists what does not fit. */
+class Validation {
+public:
+    Validation(GeneralSAR& product, std::string header) : product_{product}, header_{std::move(header)} {}
+
+    std::vector<Finding> run() {
+        check_presence();
+        check_values();
+        check_raster();
+        check_sampling();
+        check_region();
+        check_orbit();
+        check_polynomials();
+        return std::move(findings_);
+    }
+
+private:
+    void error(const char* object, const char* field, const std::string& reason) {
+        findings_.push_back({true, object, field, reason});
+    }
+    void warn(const char* object, const char* field, const std::string& reason) {
+        findings_.push_back({false, object, field, reason});
+    }
+    [[nodiscard]] bool has(GSObject object) const { return product_.GSexists(object); }
+
+    void check_presence() {
+        for (const GSObject object : {gsSamplingConstants, gsDataSetInfo, gsOrbit, gsBufferFile}) {
+            if (!has(object)) warn(section_of(object), "-", "is missing or incomplete");
+        }
+    }
+
+    // Every number must be one, and within the bounds that its field was registered with. Values that still are
+    // what a new object has mark what is unknown.
+    void check_values() {
+        GeneralSAR fresh;
+        for (int i = gsRoi; i < GeneralSAR::kObjects; ++i) {
+            const auto object = static_cast<GSObject>(i);
+            if (object == gsOrbit || !has(object)) continue;  // the state vectors are looked at once
+            const GeneralSAR_Base& values = *product_.GSget(object);
+            const GeneralSAR_Base& defaults = *fresh.GSget(object);
+            for (int k = 0; k < values.elementCount(); ++k) {
+                check_element(section_of(object), *values.element(k), *defaults.element(k));
+            }
+        }
+    }
+    void check_element(const char* section, const parElement& element, const parElement& fresh) {
+        for (int i = 0; i < element.count; ++i) {
+            const auto value = number(element, i);
+            if (!value) return;
+            if (!std::isfinite(*value)) return error(section, element.name, "is not finite");
+            const bool unknown = i < fresh.count && number(fresh, i) == value;
+            const bool bounded = element.minimum != 0.0 || element.maximum != 0.0;
+            if (bounded && !unknown && (*value < element.minimum || *value > element.maximum)) {
+                return error(
+                    section, element.name,
+                    exact(*value) + " lies outside " + exact(element.minimum) + " to " + exact(element.maximum));
+            }
+        }
+    }
+    static std::optional<double> number(const parElement& element, int i) {
+        switch (element.type) {
+            case parElement::typeDouble:
+                return static_cast<const double*>(element.pointer)[i];
+            case parElement::typeFloat:
+                return static_cast<const float*>(element.pointer)[i];
+            case parElement::typeInt:
+                return static_cast<const std::int32_t*>(element.pointer)[i];
+            case parElement::typeString:
+            case parElement::typeNone:
+                break;
+        }
+        return std::nullopt;
+    }
+
+    // The raster is looked for beside its header only, under the header's own name.
+    void check_raster() {
+        if (!has(gsBufferFile)) return;
+        const std::int64_t size = product_.bufferFile.rasterSize();
+        if (size < 0) return error("RasterInfo", "-", "describes no possible raster");
+        const auto name = raster_of(header_);
+        if (!name) return warn("RasterInfo", "-", "the header is not named like a raster's side file");
+        std::error_code failed;
+        const auto length = std::filesystem::file_size(*name, failed);
+        if (failed) return error("RasterInfo", "-", *name + ": " + failed.message());
+        if (length != static_cast<std::uintmax_t>(size)) {
+            const std::string reason =
+                *name + " has " + std::to_string(length) + " bytes, the description makes " + std::to_string(size);
+            length < static_cast<std::uintmax_t>(size) ? error("RasterInfo", "-", reason)
+                                                       : warn("RasterInfo", "-", reason);
+        }
+    }
+
+    // Two fields whose product is a constant.
+    void check_product(const char* first_name, double first, const char* second_name, double second,
+                       double expected) {
+        if (first < kUnknown || second < kUnknown) return;
+        const double off = std::abs(first * second / expected - 1.0);
+        const std::string reason =
+            std::string{"times "} + second_name + " is " + exact(first * second) + ", not " + exact(expected);
+        if (!(off < 1e-3)) {
+            error("SamplingConstants", first_name, reason);
+        } else if (off > 1e-6) {
+            warn("SamplingConstants", first_name, reason);
+        }
+    }
+    void check_sampling() {
+        if (!has(gsSamplingConstants)) return;
+        const SamplingConstants_Obj& s = product_.samplingConstants;
+        check_product("lambda_m", s.lambda_m, "fc_hz", s.fc_hz, kLightSpeed);
+        check_product("pri_s", s.pri_s, "prf_hz", s.prf_hz, 1.0);
+        check_product("Trg_s", s.Trg_s, "frg_hz", s.frg_hz, 1.0);
+        if (s.Brg_hz > s.frg_hz && s.frg_hz > 0.0)
+            error("SamplingConstants", "Brg_hz", "is larger than the sampling rate");
+        if (s.Baz_hz > s.prf_hz && s.prf_hz > 0.0) warn("SamplingConstants", "Baz_hz", "is larger than the PRF");
+        for (const auto& [name, value] :
+             {std::pair{"lambda_m", s.lambda_m}, {"prf_hz", s.prf_hz}, {"frg_hz", s.frg_hz}}) {
+            if (value > kUnknown && !(value > 0.0))
+                error("SamplingConstants", name, exact(value) + " is not above 0");
+        }
+    }
+
+    void check_axis(const char* length_name, double length, double step, int count, const char* count_name,
+                    int raster) {
+        if (!(step > 0.0)) return error("ROI", length_name, "its interval " + exact(step) + " is not above 0");
+        if (std::abs(length - step * count) > 0.5 * step) {
+            error("ROI", length_name, exact(length) + " is not " + exact(step) + " x " + std::to_string(count));
+        }
+        if (has(gsBufferFile) && raster != count) {
+            warn("ROI", count_name, std::to_string(count) + ", but the raster has " + std::to_string(raster));
+        }
+    }
+    void check_region() {
+        if (!has(gsRoi)) return;
+        const ROI_Obj& roi = product_.roi.Roi;
+        if (roi.isNULL() != 0) return warn("ROI", "-", "is empty");
+        check_axis("FastTimeLength", roi.FastTimeLength, roi.FastTimeDelta, roi.Samples, "Samples",
+                   product_.bufferFile.NrOfPixelsPerLine);
+        check_axis("SlowTimeLength", roi.SlowTimeLength, roi.SlowTimeDelta, roi.Lines, "Lines",
+                   product_.bufferFile.NrOfLinesPerImage);
+        if (!(roi.FastStartTime > 0.0))
+            error("ROI", "FastStartTime", exact(roi.FastStartTime) + " is not above 0");
+    }
+
+    void check_orbit() {
+        if (!has(gsOrbit)) return;
+        const GeneralSAROrbit& orbit = product_.orbit;
+        std::vector<SVFinding> found;
+        if (orbit.SVCheck(found) == 0) {
+            for (const SVFinding& finding : found) {
+                // Some producers' velocities are not quite the derivative of their positions.
+                const bool slight = finding.problem == SVFinding::kVelocity && finding.size < 1.0;
+                findings_.push_back({!slight, "StateVectorData", slight ? "vSV_mOs" : "pSV_m", finding.text});
+            }
+        }
+        for (std::ptrdiff_t i = 0; i < orbit.nSV_n; ++i) {
+            const auto length = [i](const auto& v) { return std::hypot(v[3 * i], v[3 * i + 1], v[3 * i + 2]); };
+            const double radius = length(orbit.pSV_m), speed = length(orbit.vSV_mOs);
+            if (!(radius > kLowestRadius_m && radius < kHighestRadius_m)) {
+                return error(
+                    "StateVectorData", "pSV_m",
+                    "vector " + std::to_string(i) + " is " + rough(radius) + " m from the Earth's centre");
+            }
+            if (!(speed > kSlowest_m_s && speed < kFastest_m_s)) {
+                return error("StateVectorData", "vSV_mOs",
+                             "vector " + std::to_string(i) + " moves at " + rough(speed) + " m/s");
+            }
+        }
+        check_coverage(orbit);
+    }
+    void check_coverage(const GeneralSAROrbit& orbit) {
+        const ROI_Obj& roi = product_.roi.Roi;
+        if (!has(gsRoi) || roi.isNULL() != 0) return;
+        const double before = roi.SlowStartTime - orbit.t0SV_s;
+        const double after =
+            orbit.t0SV_s + orbit.dtSV_s * (orbit.nSV_n - 1) - (roi.SlowStartTime + roi.SlowTimeLength);
+        const double margin = std::min(before, after);
+        if (margin < 0.0) {
+            error("StateVectorData", "t0SV_s",
+                  "the scene reaches " + rough(-margin) + " s beyond the state vectors");
+        } else if (margin < orbit.dtSV_s) {
+            warn("StateVectorData", "t0SV_s", "only " + rough(margin) + " s of orbit beyond the scene");
+        }
+    }
+
+    template <typename P>
+    void check_order(const char* name, const P& list, int count) {
+        for (int i = 1; i < count; ++i) {
+            if (!(list[i].taz0 > list[i - 1].taz0)) {
+                return error("PolySAR", name,
+                             "reference times do not increase at polynomial " + std::to_string(i));
+            }
+        }
+    }
+    void check_polynomials() {
+        if (!has(gsPolySAR)) return;
+        const polySAR& set = product_.polynomials;
+        check_order("DopplerCentroid", set.DC, set.ndc);
+        check_order("DopplerRate", set.FR, set.nfr);
+        check_order("SlantToGround", set.SL2GR, set.nsl2gr);
+        check_order("GroundToSlant", set.GR2SL, set.ngr2sl);
+        check_order("SlantToTheta", set.SL2THETA, set.nsl2theta);
+        check_order("SlantToPhi", set.SL2PHI, set.nsl2phi);
+    }
+
+    GeneralSAR& product_;
+    std::string header_;
+    std::vector<Finding> findings_;
+};
+
+int validate(const std::string& header, bool json) {
+    GeneralSAR product;
+    read_product(header, product);
+    const std::vector<Finding> findings = Validation{product, header}.run();
+    nlohmann::ordered_json list = nlohmann::json::array();
+    std::string text;
+    int errors = 0;
+    for (const Finding& finding : findings) {
+        const char* kind = finding.error ? "error" : "warning";
+        errors += finding.error ? 1 : 0;
+        list.push_back(
+            {{"kind", kind}, {"object", finding.object}, {"field", finding.field}, {"reason", finding.reason}});
+        text += std::string{kind} + "  " + finding.object + "/" + finding.field + "  " + finding.reason + "\n";
+    }
+    text += std::to_string(errors) + " errors, " + std::to_string(static_cast<int>(findings.size()) - errors) +
+            " warnings\n";
+    Output output{"-"};
+    output.write(json ? list.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n" : text);
+    output.commit();
+    return errors == 0 ? kFine : kFindings;
+}
+
+}  // namespace
+
+void add_validate(CLI::App& app, Job& job) {
+    struct Options {
+        std::string header;
+        bool json = false;
+    };
+    auto options = std::make_shared<Options>();
+    CLI::App* command = app.add_subcommand("validate", "Checks a product: bounds, and what does not fit together");
+    command->add_option("HEADER", options->header, "Product header")->required();
+    command->add_flag("--json", options->json, "Print JSON");
+    command->callback([options, &job] { job = [options] { return validate(options->header, options->json); }; });
+}
+
+}  // namespace tool
