@@ -4,7 +4,8 @@
 set -eu
 
 packages="git pkg-config ca-certificates g++ cmake ninja-build libxml2-dev libtrio-dev libcli11-dev
-nlohmann-json3-dev libgtest-dev libgmock-dev libbenchmark-dev clang-format clang-tidy"
+nlohmann-json3-dev libpng-dev libfftw3-dev libgtest-dev libgmock-dev libbenchmark-dev liblapack-dev libeigen3-dev
+clang-format clang-tidy"
 
 missing=""
 for package in $packages; do

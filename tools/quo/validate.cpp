@@ -2,6 +2,7 @@
 #include <filesystem>
 #include <memory>
 #include <nlohmann/json.hpp>
+#include <string_view>
 #include <vector>
 
 #include "commands.h"
@@ -77,7 +78,9 @@ private:
             if (!std::isfinite(*value)) return error(section, element.name, "is not finite");
             const bool unknown = i < fresh.count && number(fresh, i) == value;
             const bool bounded = element.minimum != 0.0 || element.maximum != 0.0;
-            if (bounded && !unknown && (*value < element.minimum || *value > element.maximum)) {
+            // Left-looking products carry -1, which the registered bounds do not tell.
+            const bool left = *value == -1.0 && std::string_view{element.name} == "LookDirection";
+            if (bounded && !unknown && !left && (*value < element.minimum || *value > element.maximum)) {
                 return error(
                     section, element.name,
                     exact(*value) + " lies outside " + exact(element.minimum) + " to " + exact(element.maximum));

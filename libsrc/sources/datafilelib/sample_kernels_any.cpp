@@ -1,4 +1,5 @@
 #include <cstdint>
+#include <type_traits>
 
 #include "datafilelib/kernel_table.h"
 

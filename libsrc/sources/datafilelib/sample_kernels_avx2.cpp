@@ -1,5 +1,6 @@
 // Compiled with AVX2 switched on.
 #include <cstdint>
+#include <type_traits>
 
 #include "datafilelib/kernel_table.h"
 

@@ -20,24 +20,33 @@ std::optional<std::int64_t> range_length(int low, int high) {
     return length >= 0 ? std::optional{length} : std::nullopt;
 }
 
-// The pointer whose element `low` is the block's second element. Such pointers lie outside the block for most
-// bounds, hence the arithmetic on the address.
+// Bytes of one element; elements may be pointers to rows.
 template <typename T>
-T* offset_by(T* block, int low) {
-    const auto shift = (1 - std::int64_t{low}) * static_cast<std::int64_t>(sizeof(T));
-    return reinterpret_cast<T*>(reinterpret_cast<std::uintptr_t>(block) + static_cast<std::uintptr_t>(shift));
+constexpr std::int64_t kElement = static_cast<std::int64_t>(sizeof(T));  // NOLINT(bugprone-sizeof-expression)
+
+// A pointer moved by whole elements. Pointers to an element 0 that is not there lie outside their block, hence the
+// arithmetic on the address.
+template <typename T>
+T* moved_by(T* pointer, std::int64_t elements) {
+    const auto address =
+        reinterpret_cast<std::uintptr_t>(pointer) + static_cast<std::uintptr_t>(elements * kElement<T>);
+    return reinterpret_cast<T*>(address);  // NOLINT(performance-no-int-to-ptr)
 }
 
+// The pointer whose element `low` is the block's second element, and the block of such a pointer.
+template <typename T>
+T* offset_by(T* block, int low) {
+    return moved_by(block, 1 - std::int64_t{low});
+}
 template <typename T>
 T* block_of(T* pointer, int low) {
-    const auto shift = (std::int64_t{low} - 1) * static_cast<std::int64_t>(sizeof(T));
-    return reinterpret_cast<T*>(reinterpret_cast<std::uintptr_t>(pointer) + static_cast<std::uintptr_t>(shift));
+    return moved_by(pointer, std::int64_t{low} - 1);
 }
 
 // A block of `length` elements and one of slack before them.
 template <typename T>
 T* make_block(Count length) {
-    const auto bytes = ((length + 1) * sizeof(T)).value();
+    const auto bytes = ((length + 1) * kElement<T>).value();
     return bytes ? static_cast<T*>(malloc_ckerr(static_cast<std::size_t>(*bytes))) : nullptr;
 }
 
@@ -116,43 +125,19 @@ float** make_row_pointers(const char* name, int low, std::optional<std::int64_t>
 
 extern "C" {
 
-float* vector(int nl, int nh) noexcept {
-    return make_vector<float>("vector", nl, nh);
-}
-int* ivector(int nl, int nh) noexcept {
-    return make_vector<int>("ivector", nl, nh);
-}
-int32_t* lvector(int nl, int nh) noexcept {
-    return make_vector<std::int32_t>("lvector", nl, nh);
-}
-double* dvector(int nl, int nh) noexcept {
-    return make_vector<double>("dvector", nl, nh);
-}
-double* ldvector(int nl, int nh) noexcept {
-    return make_vector<double>("ldvector", nl, nh);
-}
-unsigned char* cvector(int nl, int nh) noexcept {
-    return make_vector<unsigned char>("cvector", nl, nh);
-}
+float* vector(int nl, int nh) noexcept { return make_vector<float>("vector", nl, nh); }
+int* ivector(int nl, int nh) noexcept { return make_vector<int>("ivector", nl, nh); }
+int32_t* lvector(int nl, int nh) noexcept { return make_vector<std::int32_t>("lvector", nl, nh); }
+double* dvector(int nl, int nh) noexcept { return make_vector<double>("dvector", nl, nh); }
+double* ldvector(int nl, int nh) noexcept { return make_vector<double>("ldvector", nl, nh); }
+unsigned char* cvector(int nl, int nh) noexcept { return make_vector<unsigned char>("cvector", nl, nh); }
 
-void free_vector(float* v, int nl, int) noexcept {
-    release_vector(v, nl);
-}
-void free_ivector(int* v, int nl, int) noexcept {
-    release_vector(v, nl);
-}
-void free_lvector(int32_t* v, int nl, int) noexcept {
-    release_vector(v, nl);
-}
-void free_dvector(double* v, int nl, int) noexcept {
-    release_vector(v, nl);
-}
-void free_ldvector(double* v, int nl, int) noexcept {
-    release_vector(v, nl);
-}
-void free_cvector(unsigned char* v, int nl, int) noexcept {
-    release_vector(v, nl);
-}
+void free_vector(float* v, int nl, int) noexcept { release_vector(v, nl); }
+void free_ivector(int* v, int nl, int) noexcept { release_vector(v, nl); }
+void free_lvector(int32_t* v, int nl, int) noexcept { release_vector(v, nl); }
+void free_dvector(double* v, int nl, int) noexcept { release_vector(v, nl); }
+void free_ldvector(double* v, int nl, int) noexcept { release_vector(v, nl); }
+void free_cvector(unsigned char* v, int nl, int) noexcept { release_vector(v, nl); }
 
 float** matrix(int nrl, int nrh, int ncl, int nch) noexcept {
     return make_matrix<float>("matrix", nrl, nrh, ncl, nch);
@@ -203,27 +188,13 @@ float*** f3tensor(int nrl, int nrh, int ncl, int nch, int ndl, int ndh) noexcept
     return or_end(build());
 }
 
-void free_matrix(float** m, int nrl, int, int ncl, int) noexcept {
-    release_matrix(m, nrl, ncl);
-}
-void free_imatrix(int** m, int nrl, int, int ncl, int) noexcept {
-    release_matrix(m, nrl, ncl);
-}
-void free_dmatrix(double** m, int nrl, int, int ncl, int) noexcept {
-    release_matrix(m, nrl, ncl);
-}
-void free_ldmatrix(double** m, int nrl, int, int ncl, int) noexcept {
-    release_matrix(m, nrl, ncl);
-}
-void free_cmatrix(fcomplex** m, int nrl, int, int ncl, int) noexcept {
-    release_matrix(m, nrl, ncl);
-}
-void free_submatrix(float** b, int nrl, int, int, int) noexcept {
-    release_vector(b, nrl);
-}
-void free_convert_matrix(float** b, int nrl, int, int, int) noexcept {
-    release_vector(b, nrl);
-}
+void free_matrix(float** m, int nrl, int, int ncl, int) noexcept { release_matrix(m, nrl, ncl); }
+void free_imatrix(int** m, int nrl, int, int ncl, int) noexcept { release_matrix(m, nrl, ncl); }
+void free_dmatrix(double** m, int nrl, int, int ncl, int) noexcept { release_matrix(m, nrl, ncl); }
+void free_ldmatrix(double** m, int nrl, int, int ncl, int) noexcept { release_matrix(m, nrl, ncl); }
+void free_cmatrix(fcomplex** m, int nrl, int, int ncl, int) noexcept { release_matrix(m, nrl, ncl); }
+void free_submatrix(float** b, int nrl, int, int, int) noexcept { release_vector(b, nrl); }
+void free_convert_matrix(float** b, int nrl, int, int, int) noexcept { release_vector(b, nrl); }
 
 void free_f3tensor(float*** t, int nrl, int, int ncl, int, int ndl, int) noexcept {
     if (!t) return;
