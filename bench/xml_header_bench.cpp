@@ -58,7 +58,7 @@ std::vector<double> numbers(std::int64_t count) {
 
 /** A header file that holds `count` numbers. */
 std::string header(std::int64_t count) {
-    const std::string file = folder().file(std::to_string(count) + ".xml");
+    std::string file = folder().file(std::to_string(count) + ".xml");
     if (std::filesystem::exists(file)) return file;
     const std::vector<double> values = numbers(count);
     quorelxml document{file.c_str()};
@@ -74,7 +74,7 @@ const char* text(const xmlNode* node) {
 void read_header(benchmark::State& state) {
     const std::string file = header(state.range(0));
     std::vector<double> values(static_cast<std::size_t>(state.range(0)));
-    for (auto _ : state) {
+    while (state.KeepRunning()) {
         quorelxml document{file.c_str()};
         benchmark::DoNotOptimize(document.readDouble(1, kField, values.data(), static_cast<int>(values.size())));
     }
@@ -83,7 +83,7 @@ void read_header(benchmark::State& state) {
 void parse_and_walk(benchmark::State& state) {
     const std::string file = header(state.range(0));
     std::vector<double> values(static_cast<std::size_t>(state.range(0)));
-    for (auto _ : state) {
+    while (state.KeepRunning()) {
         xmlDoc* tree =
             xmlReadFile(file.c_str(), nullptr, XML_PARSE_NOBLANKS | XML_PARSE_COMPACT | XML_PARSE_NONET);
         // Root, channel, section, field: the last child each time.
@@ -100,7 +100,7 @@ void parse_and_walk(benchmark::State& state) {
 void write_header(benchmark::State& state) {
     const std::string file = folder().file("written.xml");
     const std::vector<double> values = numbers(state.range(0));
-    for (auto _ : state) {
+    while (state.KeepRunning()) {
         state.PauseTiming();
         std::filesystem::remove(file);  // only the document made here is to be saved
         state.ResumeTiming();
@@ -110,14 +110,12 @@ void write_header(benchmark::State& state) {
     }
 }
 
-const xmlChar* xml(const char* plain) {
-    return reinterpret_cast<const xmlChar*>(plain);
-}
+const xmlChar* xml(const char* plain) { return reinterpret_cast<const xmlChar*>(plain); }
 
 void build_and_save(benchmark::State& state) {
     const std::string file = folder().file("built.xml");
     const std::vector<double> values = numbers(state.range(0));
-    for (auto _ : state) {
+    while (state.KeepRunning()) {
         xmlDoc* tree = xmlNewDoc(xml("1.0"));
         xmlNode* node = xmlNewDocNode(tree, nullptr, xml("QuorelXmlDoc"), nullptr);
         xmlDocSetRootElement(tree, node);
@@ -146,18 +144,12 @@ using Obj = Ten;
 constexpr quo::FieldTable kTable{"Ten",        QUO_FIELD(a), QUO_FIELD(b), QUO_FIELD(c),
                                  QUO_FIELD(d), QUO_FIELD(e), QUO_FIELD(f), QUO_FIELD(g),
                                  QUO_FIELD(h), QUO_FIELD(i), QUO_FIELD(j)};
-Ten::Ten() {
-    createElementsVector(kTable.size());
-}
-void Ten::refreshParameters() {
-    kTable.register_all(*this);
-}
+Ten::Ten() { createElementsVector(kTable.size()); }
+void Ten::refreshParameters() { kTable.register_all(*this); }
 
 constexpr int kObjects = 14;
 
-std::string section(int number) {
-    return "Object" + std::to_string(number);
-}
+std::string section(int number) { return "Object" + std::to_string(number); }
 
 void write_product(const std::string& file) {
     quo::HeaderSession session{file.c_str()};
@@ -177,7 +169,7 @@ void read_product(const std::string& file) {
 void read_product_in_a_session(benchmark::State& state) {
     const std::string file = folder().file("product.xml");
     write_product(file);
-    for (auto _ : state) {
+    while (state.KeepRunning()) {
         const quo::HeaderSession session{file.c_str()};
         read_product(file);
     }
@@ -186,7 +178,7 @@ void read_product_in_a_session(benchmark::State& state) {
 void parse_product(benchmark::State& state) {
     const std::string file = folder().file("product.xml");
     write_product(file);
-    for (auto _ : state)
+    while (state.KeepRunning())
         xmlFreeDoc(xmlReadFile(file.c_str(), nullptr, XML_PARSE_NOBLANKS | XML_PARSE_COMPACT | XML_PARSE_NONET));
 }
 

@@ -136,7 +136,7 @@ private:
     friend struct quo::RegistryAccess;
     friend class GeneralSAR_BaseXML;
 
-    struct Operations;
+    struct __attribute__((visibility("hidden"))) Operations;
     enum class Exactness : std::uint8_t { kDefault, kExact, kRounded };
 
     void mirrorDescription(std::string_view text);

@@ -11,7 +11,6 @@
 
 namespace {
 
-using test::read_text;
 using test::Shelf;
 using test::write_text;
 

@@ -158,7 +158,7 @@ TEST_F(HeaderSessionTest, NestsForOtherFiles) {
 
 TEST_F(HeaderSessionTest, NeverReplacesAFileThatDoesNotFitIntoMemory) {
     std::string text = Shelf::text();
-    text.insert(text.find("Novels"), std::string(11'000'000, 'x'));
+    text.insert(text.find("Novels"), 11'000'000, 'x');
     write_text(file_, text);
     const test::CapturedStderr quiet;
     HeaderSession session{file_.c_str()};

@@ -323,6 +323,7 @@ TEST_F(Quorelxml, KeepsEveryTextThatXmlCanHold) {
         if (code >= 32 || std::strchr("\t\n\r", code)) texts.emplace_back(3, static_cast<char>(code));
     quorelxml document{new_file_.c_str()};
     std::vector<const char*> places;
+    places.reserve(texts.size());
     for (const std::string& text : texts) places.push_back(text.c_str());
     const int count = static_cast<int>(texts.size());
     EXPECT_EQ(document.writeString(1, "Sec/t", places.data(), count), 0);
@@ -330,6 +331,7 @@ TEST_F(Quorelxml, KeepsEveryTextThatXmlCanHold) {
 
     std::vector<std::vector<char>> room(texts.size(), std::vector<char>(64));
     std::vector<char*> buffers;
+    buffers.reserve(room.size());
     for (auto& buffer : room) buffers.push_back(buffer.data());
     EXPECT_EQ(quorelxml{new_file_.c_str()}.readString(1, "Sec/t", buffers.data(), count), 0);
     for (std::size_t i = 0; i < texts.size(); ++i) EXPECT_EQ(buffers[i], texts[i]);

@@ -225,13 +225,13 @@ TEST_F(Registry, WritesItsSectionOnceAndKeepsTheOthers) {
     const std::string start = "    <T>\n      <kept/>\n    </T>\n    <S>\n";
     const std::string end =
         "      <text>a &lt; b</text>\n      <texts N=\"1\">x</texts>\n      <texts N=\"2\"/>\n    </S>\n";
+    const std::string values_text =
+        "      <values>\n        <val N=\"1\">1.5</val>\n        <val N=\"2\">2.5</val>\n"
+        "        <val N=\"3\">3.5</val>\n      </values>\n      <n>3</n>\n";
+    const std::string whole = header_text(start + values_text + end);
     for (int round = 0; round < 3; ++round) {
         EXPECT_EQ(object.writeAuxiliaryFile(file_.c_str(), 1, "S"), 0);
-        EXPECT_EQ(read_text(file_), header_text(start +
-                                                "      <values>\n        <val N=\"1\">1.5</val>\n"
-                                                "        <val N=\"2\">2.5</val>\n        <val N=\"3\">3.5</val>\n"
-                                                "      </values>\n      <n>3</n>\n" +
-                                                end));
+        EXPECT_EQ(read_text(file_), whole);
     }
     count = n = 0;
     object.registration(object);

@@ -135,7 +135,8 @@ std::string random_content(std::mt19937& random, int depth) {
         }
         const std::string name = kNames[random() % std::size(kNames)];
         const char* const attribute = random() % 8 == 0 ? " xml:space=\"preserve\"" : "";
-        content += "<" + name + attribute + ">" + random_content(random, depth - 1) + "</" + name + ">";
+        content.append("<").append(name).append(attribute).append(">");
+        content.append(random_content(random, depth - 1)).append("</").append(name).append(">");
     }
     return content;
 }

@@ -3,8 +3,6 @@
 #include <cstring>
 
 #include "quo_base/profile.h"
-#include "sarutillib/bounded_text.h"
-#include "sarutillib/file_io.h"
 
 namespace quo {
 namespace {
@@ -45,23 +43,6 @@ bool read_profile_field(const FieldValue& field, const char* section, const char
     return false;
 }
 
-bool same_text(const void* a, const void* b) {
-    return text_or_empty(static_cast<const char*>(a)) == text_or_empty(static_cast<const char*>(b));
-}
-
-bool same_texts(const parElement& a, const parElement& b) {
-    if (!a.text_array) return same_text(a.pointer, b.pointer);
-    return std::equal(static_cast<char* const*>(a.pointer), static_cast<char* const*>(a.pointer) + a.count,
-                      static_cast<char* const*>(b.pointer), same_text);
-}
-
-bool same_values(const parElement& a, const parElement& b) {
-    if (a.type != b.type || a.count != b.count) return false;
-    if (a.count == 0) return true;
-    if (a.type == parElement::typeString) return same_texts(a, b);
-    return std::memcmp(a.pointer, b.pointer, static_cast<std::size_t>(a.count) * value_size(a.type, 0)) == 0;
-}
-
 }  // namespace
 
 bool read_profile_fields(std::span<const FieldValue> fields, const char* section, const char* file) {
@@ -74,29 +55,16 @@ bool read_profile_fields(std::span<const FieldValue> fields, const char* section
     return complete;
 }
 
-template <typename Values>
-static void copy_bytes(const Values& from, const Values& to) {
-    const std::size_t bytes = static_cast<std::size_t>(from.count) * value_size(from.type, from.room);
-    if (bytes > 0) std::memcpy(to.pointer, from.pointer, bytes);
+void copy_values(parElement::ParameterType type, std::int32_t count, std::size_t room, const void* from,
+                 void* to) {
+    const std::size_t bytes = static_cast<std::size_t>(count) * value_size(type, room);
+    if (bytes > 0) std::memcpy(to, from, bytes);
 }
-
-void copy_values(const FieldValue& from, const FieldValue& to) { copy_bytes(from, to); }
-
-void copy_values(const parElement& from, const parElement& to) { copy_bytes(from, to); }
 
 const parElement* registered_array(const GeneralSAR_BaseXML& object, const char* name) {
     for (int i = 0; i < object.elementCount(); ++i) {
         const parElement* element = object.element(i);
         if (std::string_view{element->name} == name) return element->count > 0 ? element : nullptr;
-    }
-    return nullptr;
-}
-
-const char* first_difference(const GeneralSAR_BaseXML& a, const GeneralSAR_BaseXML& b) {
-    for (int i = 0; i < std::max(a.elementCount(), b.elementCount()); ++i) {
-        const parElement *left = a.element(i), *right = b.element(i);
-        if (!left || !right) return (left ? left : right)->name;
-        if (!same_values(*left, *right)) return left->name;
     }
     return nullptr;
 }

@@ -53,15 +53,10 @@ struct RegistryAccess {
  * key failed. */
 bool read_profile_fields(std::span<const FieldValue> fields, const char* section, const char* file);
 
-/** Copies one field's values; both sides have the same type and count. */
-void copy_values(const FieldValue& from, const FieldValue& to);
-void copy_values(const parElement& from, const parElement& to);
+/** Copies values of one type; `room` is that of a text. */
+void copy_values(parElement::ParameterType type, std::int32_t count, std::size_t room, const void* from, void* to);
 /** The registered element of this name if it holds values now, else null. */
 const parElement* registered_array(const GeneralSAR_BaseXML& object, const char* name);
-
-/** Name of the first element in which two objects of one class differ (bit for bit; texts as far as their NUL),
- * null when there is none. */
-const char* first_difference(const GeneralSAR_BaseXML& a, const GeneralSAR_BaseXML& b);
 
 /** One row of a field table. */
 template <typename Owner>
@@ -288,7 +283,6 @@ public:
 
     [[nodiscard]] constexpr int size() const { return static_cast<int>(N); }
     [[nodiscard]] constexpr const char* section() const { return section_; }
-    [[nodiscard]] constexpr const std::array<Field<Owner>, N>& fields() const { return fields_; }
 
     /** The whole of refreshParameters(): registers every field and sets the allocation flag. */
     void register_all(Owner& object) const {
@@ -331,7 +325,8 @@ public:
         auto& source = const_cast<Owner&>(from);  // only read: the rows hand out one kind of pointer
         if (has_arrays()) to.destroyBuffers();
         for (const Field<Owner>& field : fields_)
-            if (!field.is_array_of_any_length()) copy_values(field.at(source), field.at(to));
+            if (!field.is_array_of_any_length())
+                copy_values(field.type, field.fixed_count, field.room, field.address(source), field.address(to));
         if (has_allocated(from)) {
             if (const int status = to.createBuffers()) return status;
             copy_arrays(from, to);
@@ -339,9 +334,6 @@ public:
         RegistryAccess::refresh(to);
         return QUO_OK;
     }
-
-    /** Gives every field the value that a new object has. */
-    int set_defaults(Owner& object) const { return copy(Owner{}, object); }
 
     /** Reads the fields from the parameter file: single values and arrays of fixed size, then createBuffers(),
      * then the arrays that it made. Every key is read, even after a failure.
@@ -379,7 +371,8 @@ private:
             if (!field.is_array_of_any_length()) continue;
             const parElement *source = registered_array(from, field.name),
                              *target = registered_array(to, field.name);
-            if (source && target && source->count == target->count) copy_values(*source, *target);
+            if (source && target && source->count == target->count)
+                copy_values(field.type, source->count, 0, source->pointer, target->pointer);
         }
     }
     bool read_profile_part(Owner& object, const char* file, const char* section, bool arrays) const {
