@@ -129,11 +129,11 @@ TEST(PlanStore, MeasuresAGeometryOnceAndForgetsTheOneUsedLongestAgo) {
 TEST(PlanStore, BoundsTheMemoryOfWhatItKeeps) {
     CountingEngine engine;
     quo::PlanStore store;
-    constexpr int kLength = 60000;  // a tile of 15 MB
-    FftEnginePlan* const held = store.open(engine, {quo::FftDomain::Complex, kLength, 40, 64, 1, true, true});
+    constexpr int kLength = 20000, kTileRow = 64 + 8;  // a tile of 11 MB
+    FftEnginePlan* const held = store.open(engine, {quo::FftDomain::Complex, kLength, 70, 80, 1, true, true});
     for (int extra = 1; extra <= 8; ++extra)
-        store.close(store.open(engine, {quo::FftDomain::Complex, kLength + extra, 40, 64, 1, true, true}));
-    EXPECT_EQ(store.kept(), quo::PlanStore::kMostKeptBytes / (kLength * 32 * sizeof(fcomplex)));
+        store.close(store.open(engine, {quo::FftDomain::Complex, kLength + extra, 70, 80, 1, true, true}));
+    EXPECT_EQ(store.kept(), quo::PlanStore::kMostKeptBytes / (kLength * kTileRow * sizeof(fcomplex)));
     EXPECT_NE(store.find(held), nullptr) << "a caller's plan stays, kept or not";
     EXPECT_TRUE(store.close(held));
     EXPECT_EQ(store.find(held), nullptr);

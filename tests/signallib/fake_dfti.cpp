@@ -157,7 +157,7 @@ FAKE_API Long DftiComputeForward(void* handle, void* in, ...) {
     const bool apart = static_cast<Descriptor*>(handle)->values[kPlacement] == kNotInPlace;
     void* out = apart ? va_arg(more, void*) : nullptr;
     va_end(more);
-    return told_to_fail("compute") ? kBadDescriptor : compute(handle, in, out, true);
+    return told_to_fail("compute") ? Long{kBadDescriptor} : compute(handle, in, out, true);
 }
 
 FAKE_API Long DftiComputeBackward(void* handle, void* in, ...) {
@@ -166,7 +166,7 @@ FAKE_API Long DftiComputeBackward(void* handle, void* in, ...) {
     const bool apart = static_cast<Descriptor*>(handle)->values[kPlacement] == kNotInPlace;
     void* out = apart ? va_arg(more, void*) : nullptr;
     va_end(more);
-    return told_to_fail("compute") ? kBadDescriptor : compute(handle, in, out, false);
+    return told_to_fail("compute") ? Long{kBadDescriptor} : compute(handle, in, out, false);
 }
 
 FAKE_API Long DftiFreeDescriptor(void** handle) {

@@ -11,9 +11,9 @@ namespace {
 
 constexpr const char* kSource = R"(..\..\..\binsrc\cutover\sources\interp)";
 constexpr const char* kNoMemory = "Memory allocation failure";
-constexpr int kHalf = 12;       ///< samples on either side of a position, before narrowing
+constexpr int kHalf = 16;       ///< samples on either side of a position, before narrowing
 constexpr int kPlaces = 512;    ///< tabulated places from one sample to the next
-constexpr double kShape = 7.2;  ///< of the Kaiser window
+constexpr double kShape = 9.0;  ///< of the Kaiser window
 constexpr int kMostLowpass = 64;
 
 /** Modified Bessel function of order 0, by its series; all terms are positive. */

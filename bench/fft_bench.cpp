@@ -1,0 +1,170 @@
+// Images of several shapes through the library's plans and through FFTW's own batched, measured plans;
+// zero-padding row by row beside FFTW over the whole image; making a plan that is known. The summary at the end
+// prints the ratios.
+#include <benchmark/benchmark.h>
+#include <fftw3.h>
+
+#include <algorithm>
+#include <chrono>
+#include <cstdlib>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "quo_base/fft.h"
+#include "quo_base/interp.h"
+#include "ratio_reporter.h"
+
+namespace {
+
+struct Free {
+    void operator()(fcomplex* buffer) const { fft_free(buffer); }
+};
+using Image = std::unique_ptr<fcomplex, Free>;
+
+Image make_image(int n, int m) {
+    const auto count = static_cast<std::size_t>(n) * static_cast<std::size_t>(m);
+    Image image{static_cast<fcomplex*>(fft_malloc(count * sizeof(fcomplex)))};
+    for (std::size_t k = 0; k < count; ++k)
+        image.get()[k] = {static_cast<float>(k % 17) - 8.0F, static_cast<float>(k % 13) - 6.0F};
+    return image;
+}
+
+/** Transforms along the rows, down the columns. */
+struct Job {
+    const char* name;
+    int n, m;
+    bool rows, columns;
+};
+constexpr Job kJobs[] = {{"rows_1024", 1024, 1024, true, false},         {"columns_1024", 1024, 1024, false, true},
+                         {"both_1024", 1024, 1024, true, true},          {"rows_4096", 4096, 4096, true, false},
+                         {"columns_4096", 4096, 4096, false, true},      {"both_4096", 4096, 4096, true, true},
+                         {"rows_1080", 1080, 1080, true, false},         {"columns_1080", 1080, 1080, false, true},
+                         {"rows_5760", 5760, 1080, true, false},         {"columns_5760", 1080, 5760, false, true},
+                         {"wide_columns_1080", 5760, 1080, false, true}, {"rows_4099", 4099, 256, true, false},
+                         {"columns_4099", 256, 4099, false, true}};
+
+// A transform of a transform of a transform would overflow, so each starts from a fresh image.
+void tame(fcomplex* image, int n, int m) {
+    std::fill_n(image, static_cast<std::size_t>(n) * static_cast<std::size_t>(m), fcomplex{0.37F, -0.11F});
+}
+
+void own(benchmark::State& state, const Job& job) {
+    const Image image = make_image(job.n, job.m);
+    FftPlan plan{};
+    if (fft_makep_c(&plan, job.n, job.n, job.m, job.m, job.rows, job.columns, 1) != 0)
+        return state.SkipWithError("no plan");
+    for (auto _ : state) {
+        state.PauseTiming();
+        tame(image.get(), job.n, job.m);
+        state.ResumeTiming();
+        pfft_c(&plan, image.get(), image.get());
+    }
+    fft_destp_c(&plan);
+}
+
+fftwf_plan measured(const Job& job, bool rows, fftwf_complex* data) {
+    return rows ? fftwf_plan_many_dft(1, &job.n, job.m, data, nullptr, 1, job.n, data, nullptr, 1, job.n,
+                                      FFTW_FORWARD, FFTW_MEASURE)
+                : fftwf_plan_many_dft(1, &job.m, job.n, data, nullptr, job.n, 1, data, nullptr, job.n, 1,
+                                      FFTW_FORWARD, FFTW_MEASURE);
+}
+
+void bare(benchmark::State& state, const Job& job) {
+    const Image image = make_image(job.n, job.m);
+    auto* const data = reinterpret_cast<fftwf_complex*>(image.get());
+    std::vector<fftwf_plan> plans;
+    if (job.rows) plans.push_back(measured(job, true, data));
+    if (job.columns) plans.push_back(measured(job, false, data));
+    for (auto _ : state) {
+        state.PauseTiming();
+        tame(image.get(), job.n, job.m);
+        state.ResumeTiming();
+        for (fftwf_plan plan : plans) fftwf_execute(plan);
+    }
+    for (fftwf_plan plan : plans) fftwf_destroy_plan(plan);
+}
+
+constexpr int kRows = 1024, kShort = 4096, kLong = 8192;
+
+void pad_own(benchmark::State& state) {
+    const Image in = make_image(kShort, kRows), out = make_image(kLong, kRows);
+    interp resampler;
+    if (resampler.setplans(kShort, kRows, kLong, kRows) != 0) return state.SkipWithError("no plan");
+    for (auto _ : state) {
+        state.PauseTiming();
+        tame(in.get(), kShort, kRows);
+        state.ResumeTiming();
+        resampler.interpft_p(in.get(), out.get());
+    }
+}
+
+void pad_bare(benchmark::State& state) {
+    const Image in = make_image(kShort, kRows), out = make_image(kLong, kRows);
+    fftwf_plan forward =
+        measured({"", kShort, kRows, true, false}, true, reinterpret_cast<fftwf_complex*>(in.get()));
+    auto* const data = reinterpret_cast<fftwf_complex*>(out.get());
+    fftwf_plan inverse = fftwf_plan_many_dft(1, &kLong, kRows, data, nullptr, 1, kLong, data, nullptr, 1, kLong,
+                                             FFTW_BACKWARD, FFTW_MEASURE);
+    for (auto _ : state) {
+        state.PauseTiming();
+        tame(in.get(), kShort, kRows);
+        state.ResumeTiming();
+        fftwf_execute(forward);
+        for (std::ptrdiff_t row = 0; row < kRows; ++row) {
+            const fcomplex* from = in.get() + row * kShort;
+            fcomplex* to = out.get() + row * kLong;
+            std::copy_n(from, kShort / 2 + 1, to);
+            std::fill_n(to + kShort / 2 + 1, kLong - kShort, fcomplex{});
+            std::copy_n(from + kShort / 2 + 1, kShort / 2 - 1, to + kLong - kShort / 2 + 1);
+        }
+        fftwf_execute(inverse);
+        for (std::ptrdiff_t k = 0; k < std::ptrdiff_t{kRows} * kLong; ++k) out.get()[k] *= 2.0F / kLong;
+    }
+    fftwf_destroy_plan(forward);
+    fftwf_destroy_plan(inverse);
+}
+
+void make_known_plan(benchmark::State& state) {
+    FftPlan plan{};
+    const auto make = [&plan] { return fft_makep_c(&plan, 1080, 1080, 1024, 1024, 1, 1, 1); };
+    if (make() == 0) fft_destp_c(&plan);  // measured here
+    for (auto _ : state) {
+        if (make() != 0) return state.SkipWithError("no plan");
+        fft_destp_c(&plan);
+    }
+}
+
+/** Stands for the time that a known plan may take: the ratio's other side. */
+void two_microseconds(benchmark::State& state) {
+    for (auto _ : state) {
+        const auto end = std::chrono::steady_clock::now() + std::chrono::microseconds{2};
+        while (std::chrono::steady_clock::now() < end) {
+        }
+    }
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    setenv("QUO_FFTW_MODULE", QUO_BENCH_FFTW_MODULE, 0);
+    static std::vector<std::string> names;
+    names.reserve(2 * std::size(kJobs));
+    std::vector<bench::Ratio> ratios;
+    for (const Job& job : kJobs) {
+        const std::string& mine = names.emplace_back(std::string{"own/"} + job.name);
+        const std::string& peer = names.emplace_back(std::string{"fftw/"} + job.name);
+        benchmark::RegisterBenchmark(mine.c_str(), own, job)->Unit(benchmark::kMillisecond);
+        benchmark::RegisterBenchmark(peer.c_str(), bare, job)->Unit(benchmark::kMillisecond);
+        const bool long_columns = job.columns && !job.rows && job.m >= 4096;
+        ratios.push_back({job.name, mine.c_str(), peer.c_str(),
+                          !long_columns ? 1.05 : (job.m == 5760 ? 1.0 / 1.5 : 1.0 / 1.25)});
+    }
+    benchmark::RegisterBenchmark("own/zero_padding", pad_own)->Unit(benchmark::kMillisecond);
+    benchmark::RegisterBenchmark("fftw/zero_padding", pad_bare)->Unit(benchmark::kMillisecond);
+    benchmark::RegisterBenchmark("own/known_plan", make_known_plan);
+    benchmark::RegisterBenchmark("two_microseconds", two_microseconds);
+    ratios.push_back({"zero padding 4096 -> 8192", "own/zero_padding", "fftw/zero_padding", 1.0});
+    ratios.push_back({"making and releasing a known plan", "own/known_plan", "two_microseconds", 1.0});
+    return bench::run(argc, argv, ratios);
+}
