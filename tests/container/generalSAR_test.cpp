@@ -1,0 +1,384 @@
+#include "quo_base/generalSAR.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <cerrno>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+#include "products.h"
+#include "support/diagnostics.h"
+
+namespace {
+
+using test::differences, test::fill_product, test::present_in;
+using testing::ElementsAre, testing::Each, testing::HasSubstr, testing::IsEmpty;
+
+class Product : public testing::Test {
+protected:
+    /** A file in a folder of its own, so that names stay the same. */
+    std::string file(const char* folder, const char* name) {
+        std::filesystem::create_directories(report_.file(folder));
+        errno = 0;
+        return report_.file(std::string{folder} + "/" + name);
+    }
+    const test::Report report_;
+};
+
+// --- objects and flags
+// --------------------------------------------------------------------------------------------
+
+TEST_F(Product, GivesEachObjectUnderItsNumber) {
+    GeneralSAR p;
+    const struct {
+        GSObject number;
+        int value;
+        GeneralSAR_Base* object;
+    } rows[] = {{gsDataFile, 0, &p.dataFile},
+                {gsRoi, 1, &p.roi},
+                {gsPolySAR, 2, &p.polynomials},
+                {gsSamplingConstants, 3, &p.samplingConstants},
+                {gsStateVectors, 4, &p.stateVectors},
+                {gsOrbit, 5, &p.orbit},
+                {gsPulse, 6, &p.pulse},
+                {gsAntennaPattern, 7, &p.antennaPattern},
+                {gsDataSetInfo, 8, &p.dataSetInfo},
+                {gsSensorAttitude, 9, &p.sensorAttitude},
+                {gsSpectralWindows, 10, &p.spectralWindows},
+                {gsGeoCoords, 11, &p.geoCoords},
+                {gsSwathInfo, 12, &p.swathInfo},
+                {gsBufferFile, 13, &p.bufferFile}};
+    for (const auto& row : rows) {
+        EXPECT_EQ(row.number, row.value);
+        EXPECT_EQ(p.GSget(row.number), row.object) << row.value;
+        EXPECT_FALSE(p.GSexists(row.number));
+        EXPECT_EQ(p.GSenable(row.number), 0);
+        EXPECT_THAT(present_in(p), ElementsAre(row.number));
+        EXPECT_EQ(p.GSdisable(row.number), 0);
+        EXPECT_THAT(present_in(p), IsEmpty());
+    }
+    for (const int number : {-1, 14, 2147483647}) {
+        const auto none = static_cast<GSObject>(number);
+        EXPECT_EQ(p.GSget(none), nullptr);
+        EXPECT_EQ(p.GSenable(none), 1);
+        EXPECT_EQ(p.GSdisable(none), 1);
+        EXPECT_FALSE(p.GSexists(none));
+    }
+}
+
+// --- reading and writing
+// ------------------------------------------------------------------------------------------
+
+class ProductFile : public Product, public testing::WithParamInterface<const char*> {};
+
+TEST_P(ProductFile, ComesBackFieldByField) {
+    GeneralSAR source, target, again;
+    fill_product(source);
+    const std::string name = file("a", GetParam()), second = file("b", GetParam());
+    ASSERT_EQ(source.GSwrite(name.c_str()), 0);
+    ASSERT_EQ(target.GSread(name.c_str()), 0);
+    EXPECT_EQ(present_in(target), test::all_objects());
+    EXPECT_THAT(differences(source, target), IsEmpty());
+    EXPECT_THAT(target.swathInfo.Swst_changes_bursts, ElementsAre(0, 0, 0));
+    EXPECT_THAT(report_.entries("ERROR"), IsEmpty());
+
+    ASSERT_EQ(target.GSwrite(second.c_str()), 0);
+    EXPECT_EQ(test::read_text(second), test::read_text(name));
+    ASSERT_EQ(again.GSread(second.c_str()), 0);
+    EXPECT_THAT(differences(source, again), IsEmpty());
+}
+
+const char* const kOlderContent =
+    "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<!-- kept -->\n<QuorelXmlDoc>\n"
+    "<NumberOfChannels>2</NumberOfChannels><Description>A scene</Description>\n"
+    "<Channel Number=\"1\"><Foreign unit=\"m\"><a>17.3</a><a>-3.7</a></Foreign><Pulse><Old>1</Old></Pulse>"
+    "<PolySAR><ndc>1</ndc><Stray/></PolySAR></Channel>\n"
+    "<Channel Number=\"2\"><Pulse><PulseLength>803</PulseLength></Pulse></Channel>\n<Unknown/></QuorelXmlDoc>\n";
+
+/** Writes the present objects one after the other, as the container is documented to do. */
+void write_one_by_one(GeneralSAR& product, const std::string& name) {
+    for (int i = GeneralSAR::kObjects; i-- > 0;) {
+        const auto object = static_cast<GSObject>(i);
+        if (product.GSexists(object)) product.GSget(object)->writehdr(name.c_str());
+    }
+}
+
+TEST_P(ProductFile, HasTheBytesOfWritingObjectByObject) {
+    GeneralSAR product;
+    fill_product(product);
+    for (const char* older : {"", kOlderContent, "no header at all"}) {
+        const std::string name = file("a", GetParam()), other = file("b", GetParam());
+        for (const std::string& target : {name, other}) {
+            std::filesystem::remove(target);
+            if (*older) test::write_text(target, older);
+        }
+        ASSERT_EQ(product.GSwrite(name.c_str()), 0);
+        write_one_by_one(product, other);
+        EXPECT_EQ(test::read_text(name), test::read_text(other));
+        EXPECT_EQ(test::read_text(file("a", "scene.hdr")), test::read_text(file("b", "scene.hdr")));
+    }
+}
+
+TEST_P(ProductFile, KeepsWhatItDoesNotKnow) {
+    GeneralSAR product, read;
+    fill_product(product);
+    const std::string name = file("a", GetParam());
+    test::write_text(name, kOlderContent);
+    ASSERT_EQ(product.GSwrite(name.c_str()), 0);
+    const std::string text = test::read_text(name);
+    for (const char* kept : {"<!-- kept -->", "<Foreign unit=\"m\">", "<a>17.3</a>", "<a>-3.7</a>", "<Unknown/>",
+                             "<Channel Number=\"2\">", "<PulseLength>803</PulseLength>"})
+        EXPECT_THAT(text, HasSubstr(kept));
+    EXPECT_EQ(text.find("<Old>"), text.npos);
+    EXPECT_EQ(text.find("<Stray"), text.npos);
+    ASSERT_EQ(read.GSread(name.c_str()), 0);
+    EXPECT_THAT(differences(product, read), IsEmpty());
+}
+INSTANTIATE_TEST_SUITE_P(Names, ProductFile, testing::Values("scene.hdr", "scene.xml"),
+                         [](const auto& row) { return std::string{row.param}.substr(6); });
+
+TEST_F(Product, WritesItsSectionsInReverseOrder) {
+    GeneralSAR product;
+    fill_product(product);
+    const std::string name = file("a", "scene.xml"), side = file("a", "scene.hdr");
+    ASSERT_EQ(product.GSwrite(name.c_str()), 0);
+    const std::string text = test::read_text(name);
+    const auto start = text.find("<Channel Number=\"1\">");
+    ASSERT_NE(start, text.npos);
+    std::string channel = text.substr(start);
+    channel.replace(0, std::string{"<Channel Number=\"1\">"}.size(), "<Channel>");
+    EXPECT_THAT(test::child_names(channel, "Channel"),
+                ElementsAre("RasterInfo", "SwathInfo", "GroundCornersPoints", "SpectralWindows", "SensorAttitude",
+                            "DataSetInfo", "AntennaPattern", "Pulse", "StateVectorData", "SamplingConstants",
+                            "PolySAR", "ROI"));
+    EXPECT_NE(test::element_text(test::read_text(side), "RasterInfo"), "");
+}
+
+// Where the raster's side file is the header itself, its section is the data file's, and the last one.
+TEST_F(Product, SharesTheRasterSectionOfItsHeader) {
+    GeneralSAR product, read;
+    fill_product(product);
+    product.bufferFile.NrOfPixelsPerLine = 29;
+    const std::string name = file("a", "scene.hdr");
+    ASSERT_EQ(product.GSwrite(name.c_str()), 0);
+    const std::string text = test::read_text(name);
+    EXPECT_EQ(text.find("<RasterInfo>"), text.rfind("<RasterInfo>"));
+    EXPECT_GT(text.find("<RasterInfo>"), text.find("<ROI>"));
+    ASSERT_EQ(read.GSread(name.c_str()), 0);
+    EXPECT_EQ(read.bufferFile.NrOfPixelsPerLine, 17);
+    EXPECT_EQ(read.dataFile.File.NrOfPixelsPerLine, 17);
+}
+
+// Each section alone: the object and those that need no section are there, nothing else.
+TEST_F(Product, HasTheObjectsWhoseSectionsAreThere) {
+    const std::string name = file("a", "scene.xml");
+    for (const GSObject object : test::all_objects()) {
+        SCOPED_TRACE(object);
+        GeneralSAR source, target;
+        fill_product(source);
+        for (const GSObject other : test::all_objects())
+            if (other != object) source.GSdisable(other);
+        std::filesystem::remove(name);
+        source.GSwrite(name.c_str());
+        if (object == gsDataFile) test::write_text(name, "");
+
+        std::vector<GSObject> expected = {gsDataFile};
+        if (object == gsStateVectors || object == gsOrbit) {
+            expected.insert(expected.end(), {gsStateVectors, gsOrbit});
+        } else if (object != gsDataFile) {
+            expected.push_back(object);
+        }
+        // The antenna pattern needs its raster too, which the data file wrote at first.
+        EXPECT_EQ(target.GSread(name.c_str()), 0);
+        EXPECT_EQ(present_in(target), expected);
+    }
+}
+
+TEST_F(Product, ReadsAnOldParameterFile) {
+    const std::string name = file("a", "old.hdr");
+    test::write_text(name,
+                     "[Pulse]\nPulseLength = 37.12e-6\nBandwidth = 15.55e6\nPulseKRate = 1\nPulseEnergy = 2\n"
+                     "PulseSamplingRate = 18.962468e6\n[AntennaPattern]\nStartAngle = 17.25\nDeltaAngle = 0.0625\n"
+                     "[RasterInfo]\nHeaderOffset = 0\nRowPrefix = 0\nNrOfPixelsPerLine = 29\n"
+                     "NrOfLinesPerImage = 803\nCellType = FLOAT32\nByteOrder = MSBFirst\n");
+    GeneralSAR product;
+    ASSERT_EQ(product.GSread(name.c_str()), 0);
+    EXPECT_THAT(present_in(product), ElementsAre(gsDataFile, gsPulse, gsAntennaPattern));
+    EXPECT_EQ(product.pulse.Bandwidth, 15.55e6);
+    EXPECT_EQ(product.antennaPattern.PatternSamples, 29);
+    EXPECT_EQ(product.dataFile.File.ByteOrder, 1);
+}
+
+TEST_F(Product, SaysThatAFileDoesNotExist) {
+    GeneralSAR product, same;
+    fill_product(product);
+    fill_product(same);
+    const std::string name = report_.file("missing.xml");
+    EXPECT_EQ(product.GSread(name.c_str()), 1);
+    EXPECT_EQ(product.GSread(nullptr), 1);
+    EXPECT_THAT(report_.messages("ERROR"),
+                ElementsAre("File : " + name + " DOES NOT EXIST!", "File :  DOES NOT EXIST!"));
+    EXPECT_EQ(present_in(product), test::all_objects());
+    EXPECT_THAT(differences(product, same), IsEmpty());
+    EXPECT_FALSE(std::filesystem::exists(name));
+}
+
+// Names are text: never a format, and never cut into another message.
+TEST_F(Product, TakesNamesAsTheyStand) {
+    GeneralSAR product;
+    EXPECT_EQ(product.GSread("%s%n%d"), 1);
+    EXPECT_EQ(product.GSread(std::string(5000, 'n').c_str()), 1);
+    EXPECT_EQ(report_.messages("ERROR").front(), "File : %s%n%d DOES NOT EXIST!");
+}
+
+TEST_F(Product, ForgetsTheProductBefore) {
+    GeneralSAR product;
+    fill_product(product);
+    const std::string name = file("a", "empty.xml");
+    test::write_text(name, "");
+    EXPECT_EQ(product.GSread(name.c_str()), 0);
+    EXPECT_THAT(present_in(product), ElementsAre(gsDataFile));
+    EXPECT_EQ(product.polynomials.ndc, 0);
+    EXPECT_EQ(product.stateVectors.pSV_m, nullptr);
+    EXPECT_EQ(product.orbit.pSV_m, nullptr);
+    EXPECT_THAT(product.antennaPattern.Pattern, IsEmpty());
+}
+
+TEST_F(Product, WritesNothingWhenNothingIsPresent) {
+    GeneralSAR product;
+    const std::string name = report_.file("none.hdr");
+    EXPECT_EQ(product.GSwrite(name.c_str()), 0);
+    EXPECT_FALSE(std::filesystem::exists(name));
+    test::write_text(name, "as it was");
+    EXPECT_EQ(product.GSwrite(name.c_str()), 0);
+    EXPECT_EQ(test::read_text(name), "as it was");
+}
+
+// One object that cannot be written keeps no other from the file.
+TEST_F(Product, WritesTheOthersOfAnObjectThatCannotBeWritten) {
+    GeneralSAR product, read;
+    fill_product(product);
+    product.dataSetInfo.Track[0] = '\x01';
+    const std::string name = file("a", "scene.hdr"), other = file("b", "scene.hdr");
+    EXPECT_EQ(product.GSwrite(name.c_str()), 0);
+    write_one_by_one(product, other);
+    EXPECT_EQ(test::read_text(name), test::read_text(other));
+    ASSERT_EQ(read.GSread(name.c_str()), 0);
+    EXPECT_FALSE(read.GSexists(gsDataSetInfo));
+    EXPECT_EQ(present_in(read).size(), 13U);
+}
+
+TEST_F(Product, Says0AndReportsWhereNothingCanBeWritten) {
+    GeneralSAR product;
+    fill_product(product);
+    EXPECT_EQ(product.GSwrite(report_.file("no_such_folder/scene.hdr").c_str()), 0);
+    EXPECT_THAT(report_.messages("ERROR"), testing::Contains("File writing failed!"));
+}
+
+// --- links
+// --------------------------------------------------------------------------------------------------------
+
+TEST_F(Product, LinksItsObjectsAfterReading) {
+    const struct { bool sampling, info; } rows[] = {{true, true}, {true, false}, {false, true}, {false, false}};
+    for (const auto& row : rows) {
+        SCOPED_TRACE(testing::Message() << row.sampling << row.info);
+        GeneralSAR source, target;
+        fill_product(source);
+        source.samplingConstants.lambda_m = 0.2384;
+        source.dataSetInfo.LookDirection = -1;
+        if (!row.sampling) source.GSdisable(gsSamplingConstants);
+        if (!row.info) source.GSdisable(gsDataSetInfo);
+        const std::string name = file(row.sampling ? (row.info ? "a" : "b") : (row.info ? "c" : "d"), "scene.hdr");
+        ASSERT_EQ(source.GSwrite(name.c_str()), 0);
+        ASSERT_EQ(target.GSread(name.c_str()), 0);
+        EXPECT_EQ(target.orbit.getLambda(), row.sampling ? 0.2384 : GeneralSAROrbit{}.getLambda());
+        EXPECT_EQ(target.orbit.getLookSign(), row.info ? -1 : GeneralSAROrbit{}.getLookSign());
+        EXPECT_EQ(target.stateVectors.LookDirection, row.info ? -1 : 0);
+    }
+}
+
+// --- copying and clearing
+// -----------------------------------------------------------------------------------------
+
+TEST_F(Product, ClonesWhatIsPresent) {
+    for (const GSObject object : test::all_objects()) {
+        SCOPED_TRACE(object);
+        GeneralSAR source, target;
+        fill_product(source);
+        for (const GSObject other : test::all_objects())
+            if (other != object) source.GSdisable(other);
+        target.GSenable(gsPulse);
+        target.pulse.Bandwidth = 803457.3;
+        ASSERT_EQ(source.GSclone(&target), 0);
+        EXPECT_TRUE(target.GSexists(object));
+        EXPECT_TRUE(target.GSexists(gsPulse));
+        EXPECT_EQ(present_in(target).size(), object == gsPulse ? 1U : 2U);
+        EXPECT_EQ(target.pulse.Bandwidth, object == gsPulse ? source.pulse.Bandwidth : 803457.3);
+    }
+}
+
+TEST_F(Product, ClonesEveryField) {
+    GeneralSAR source, target;
+    const std::string name = file("a", "scene.hdr"), copy = file("b", "scene.hdr");
+    fill_product(source);
+    ASSERT_EQ(source.GSclone(&target), 0);
+    EXPECT_EQ(present_in(target), test::all_objects());
+    // What is registered beside the member follows with the next write.
+    source.GSwrite(name.c_str());
+    target.GSwrite(copy.c_str());
+    EXPECT_EQ(test::read_text(name), test::read_text(copy));
+    EXPECT_THAT(differences(source, target), IsEmpty());
+    EXPECT_EQ(source.GSclone(&source), 0);
+    EXPECT_EQ(source.GSclone(nullptr), 1);
+    EXPECT_THAT(differences(source, target), IsEmpty());
+}
+
+TEST_F(Product, DestroysContentsAndKeepsFlags) {
+    GeneralSAR product;
+    fill_product(product);
+    product.swathInfo.BurstStartTimes = {17.3};
+    EXPECT_EQ(product.GSdestroy(), 0);
+    EXPECT_EQ(present_in(product), test::all_objects());
+    EXPECT_EQ(product.polynomials.ndc, 0);
+    EXPECT_EQ(product.polynomials.DC, nullptr);
+    EXPECT_EQ(product.stateVectors.pSV_m, nullptr);
+    EXPECT_EQ(product.orbit.vSV_mOs, nullptr);
+    EXPECT_THAT(product.swathInfo.Swst_changes_bursts, IsEmpty());
+    EXPECT_THAT(product.swathInfo.BurstStartTimes, IsEmpty());
+    EXPECT_THAT(product.antennaPattern.Pattern, IsEmpty());
+    EXPECT_EQ(product.GSdestroy(), 0);
+}
+
+// --- hostile headers
+// ----------------------------------------------------------------------------------------------
+
+// A header cut or with a byte changed anywhere is read without harm, and what it says of itself opens nothing: the
+// folder holds the same files afterwards.
+TEST_F(Product, ReadsDamagedHeaders) {
+    GeneralSAR source, target;
+    fill_product(source);
+    const std::string name = file("a", "scene.hdr");
+    ASSERT_EQ(source.GSwrite(name.c_str()), 0);
+    const std::string whole = test::read_text(name);
+    set_flg_report(0);
+    for (std::size_t at = 1; at < whole.size(); at += 397) {
+        test::write_text(name, whole.substr(0, at));
+        EXPECT_EQ(target.GSread(name.c_str()), 0);
+        std::string flipped = whole;
+        flipped[at] = static_cast<char>(flipped[at] ^ 0x15);
+        test::write_text(name, flipped);
+        EXPECT_EQ(target.GSread(name.c_str()), 0);
+    }
+    const auto entries = std::filesystem::directory_iterator{report_.file("a")};
+    EXPECT_EQ(std::distance(begin(entries), end(entries)), 1);
+}
+
+TEST_F(Product, ReadsAFolderAsAProductOfNothing) {
+    GeneralSAR product;
+    EXPECT_EQ(product.GSread(report_.folder().path().c_str()), 0);
+    EXPECT_THAT(present_in(product), ElementsAre(gsDataFile));
+}
+
+}  // namespace
