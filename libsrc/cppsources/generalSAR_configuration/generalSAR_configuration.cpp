@@ -217,13 +217,6 @@ constexpr quo::FieldTable kTable{
     throw quorelException(line, function, kSource, message);
 }
 
-template <typename Table>
-const auto* field_at(const Table& table, int index) {
-    const auto& fields = table.fields();
-    return index >= 0 && static_cast<std::size_t>(index) < fields.size() ? &fields[static_cast<std::size_t>(index)]
-                                                                         : nullptr;
-}
-
 }  // namespace
 
 GeneralSAR_BaseConfiguration::~GeneralSAR_BaseConfiguration() = default;
@@ -291,7 +284,10 @@ int GeneralSAR_ConfigurationRecord::clone(GeneralSAR_BaseConfiguration* to) cons
     auto* record = dynamic_cast<GeneralSAR_ConfigurationRecord*>(to);
     if (!record || typeid(*record) != typeid(*this)) return QUO_REFUSED;
     GeneralSAR_BaseConfiguration::clone(to);
-    for (int i = 0; i < elementCount(); ++i) quo::copy_values(*element(i), *record->element(i));
+    for (int i = 0; i < elementCount(); ++i) {
+        const parElement& from = *element(i);
+        quo::copy_values(from.type, from.count, from.room, from.pointer, record->element(i)->pointer);
+    }
     return QUO_OK;
 }
 
@@ -302,11 +298,11 @@ int GeneralSAR_ConfigurationRecord::clone(GeneralSAR_BaseConfiguration* to) cons
     }                                                                         \
     void Class::refreshParameters() { part::kTable.register_all(*this); }     \
     const char* Class::unit(int index) const {                                \
-        const auto* field = field_at(part::kTable, index);                    \
+        const auto* field = part::kTable.row(index);                          \
         return field ? field->unit : "";                                      \
     }                                                                         \
     const char* Class::meaning(int index) const {                             \
-        const auto* field = field_at(part::kTable, index);                    \
+        const auto* field = part::kTable.row(index);                          \
         return field ? field->meaning : "";                                   \
     }
 QUO_RECORD(AzimuthConf, azimuth)

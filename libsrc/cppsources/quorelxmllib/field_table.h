@@ -283,6 +283,10 @@ public:
 
     [[nodiscard]] constexpr int size() const { return static_cast<int>(N); }
     [[nodiscard]] constexpr const char* section() const { return section_; }
+    /** The row of an element, by its index; null beyond. */
+    [[nodiscard]] constexpr const Field<Owner>* row(int index) const {
+        return index >= 0 && index < size() ? &fields_[static_cast<std::size_t>(index)] : nullptr;
+    }
 
     /** The whole of refreshParameters(): registers every field and sets the allocation flag. */
     void register_all(Owner& object) const {
