@@ -31,7 +31,8 @@ struct Bench {
         length_s = 4.0 * orbit.dtSV_s;
         orb_interp(0.0, orbit.dtSV_s, orbit.pSV_m + 3 * first, nullptr, 5, c[0], c[1], c[2]);
         for (std::size_t i = 0; i < kLines * kColumns; ++i) {
-            const double line = static_cast<double>(i / kColumns) / kLines;
+            const std::size_t row = i / kColumns;
+            const double line = static_cast<double>(row) / kLines;
             const double column = static_cast<double>(i % kColumns) / kColumns;
             times.push_back(extent.first_s + line * (extent.last_s - extent.first_s));
             ranges.push_back(extent.near_s + column * (extent.far_s - extent.near_s));
@@ -59,7 +60,7 @@ void each_point(benchmark::State& state, Body body) {
 }
 
 void two_frames(benchmark::State& state) {
-    for (auto _ : state) {
+    for (auto _ : state) {  // NOLINT(clang-analyzer-deadcode.DeadStores): the library's own loop
         for (int i = 0; i < 2; ++i) {
             quo::CallFrame frame{"two_frames", "geolocation_bench"};
             benchmark::DoNotOptimize(frame.success());
