@@ -1,0 +1,1 @@
+quo_bench(product SOURCES product_bench.cpp COMPONENTS container)
