@@ -293,7 +293,7 @@ public:
      * @return 0; 1 for null; or the status of SVGetLatLon() or SVGetAngles() */
     int SVGetGeoCoords(geoCoords_Obj* grid, const GSRoi_Obj* roi) noexcept;
 
-    // --- polynomials derived from the orbit ---
+    // --- polynomials derived from the orbit ------------------------------------------------------
     // Least-squares fits of the geometry over a region's fast and slow start and length. `dc` tells the Doppler of
     // every sample. 1 for a region or Doppler that is null, 10 for a fit that does not give finite numbers, else
     // the status of the sampled geometry, of polfit() or of lfitd(). An output that is null is skipped; all

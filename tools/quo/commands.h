@@ -22,6 +22,9 @@ void add_convert(CLI::App& app, Job& job);
 void add_quicklook(CLI::App& app, Job& job);
 void add_footprint(CLI::App& app, Job& job);
 void add_vrt(CLI::App& app, Job& job);
+void add_derive(CLI::App& app, Job& job);
+void add_fit(CLI::App& app, Job& job);
+void add_coregister(CLI::App& app, Job& job);
 
 }  // namespace tool
 

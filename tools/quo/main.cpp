@@ -31,6 +31,9 @@ int run(int argc, char** argv) {
     tool::add_quicklook(app, job);
     tool::add_footprint(app, job);
     tool::add_vrt(app, job);
+    tool::add_derive(app, job);
+    tool::add_fit(app, job);
+    tool::add_coregister(app, job);
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {

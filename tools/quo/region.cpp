@@ -1,0 +1,37 @@
+#include "region.h"
+
+#include <cmath>
+#include <filesystem>
+
+#include "failure.h"
+#include "quo_base/quorelxml_v2.h"
+
+namespace tool {
+namespace {
+
+/** Asks a file whether it is a header document. */
+class Document : private quorelxml {
+public:
+    static bool in(const std::string& file) {
+        Document document;
+        document.storeFileName(file.c_str());
+        return document.parse() == QUO_OK && document.isRecognized();
+    }
+};
+
+}  // namespace
+
+void read_region(const std::string& header, ROI_Obj& region) {
+    const bool found = region.read_roi(header.c_str(), "ROI") == QUO_OK && region.isNULL() == 0;
+    const double sum = region.FastStartTime + region.FastTimeLength + region.SlowStartTime + region.SlowTimeLength;
+    if (!found || !std::isfinite(sum)) throw Failure(header + ": no region (section ROI)");
+}
+
+void require_document(const std::string& file, bool may_be_missing) {
+    std::error_code error;
+    if (may_be_missing && std::filesystem::status(file, error).type() == std::filesystem::file_type::not_found)
+        return;
+    if (!Document::in(file)) throw Failure(file + ": is no header document");
+}
+
+}  // namespace tool
