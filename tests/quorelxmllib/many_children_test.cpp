@@ -61,6 +61,13 @@ protected:
         model_.clear();
         clear_all();
     }
+    // Texts beside elements make a save load the tree once more.
+    void save_with_mixed_content() {
+        const char* text = "text";
+        ASSERT_EQ(document_.writeString(1, "Mixed", &text, 1), 0);
+        ASSERT_EQ(document_.createField(1, "Mixed/element"), 0);
+        ASSERT_EQ(document_.write(), 0);
+    }
     void look_up() {
         const std::string name = any_name();
         std::int32_t value = -1;
@@ -70,7 +77,8 @@ protected:
     }
 
     std::mt19937 random_{GetParam()};
-    test::OpenDocument document_{""};
+    test::TemporaryFolder folder_;
+    test::OpenDocument document_{folder_.file("header.xml").c_str()};
     Model model_;
 };
 
@@ -87,6 +95,8 @@ TEST_P(ManyChildren, AreFoundWhateverCameAndWent) {
             clear_all();
         else if (choice < 443)
             replace_by_text();
+        else if (choice < 446)
+            save_with_mixed_content();
         look_up();
         ASSERT_FALSE(HasFailure()) << "step " << step;
     }

@@ -216,6 +216,7 @@ bool HeaderDocument::save(const char* file) {
     if (top && has_mixed_content(top)) {
         XmlTree again = reloaded(tree_.get());
         if (!again) return false;
+        indices_.clear();
         tree_ = std::move(again);
     }
     // Without an encoder the text, which is UTF-8 in memory, is written as it stands: the bytes are those of
