@@ -205,5 +205,5 @@ int main(int argc, char** argv) {
                        {"write 1000", "write_header/1000", "build_and_save/1000", 2.2},
                        {"write 10000", "write_header/10000", "build_and_save/10000", 2.2},
                        {"write 100000", "write_header/100000", "build_and_save/100000", 2.2},
-                       {"read a product of 14 objects", "read_product_in_a_session", "parse_product", 2.0}});
+                       {"read a product of 14 objects", "read_product_in_a_session", "parse_product", 2.5}});
 }
