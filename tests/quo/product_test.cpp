@@ -21,7 +21,7 @@ protected:
     // A copy of a bundled scene that the test may change.
     std::string copy_of_scene(const char* name = "scene.xml") {
         const std::string copy = folder_.file(name);
-        test::write_text(copy, test::read_text(test::scenes().front()));
+        test::write_text(copy, test::read_text(test::scene_file(test::scenes().front())));
         return copy;
     }
     static void expect_finding(const std::string& header, int exit_status, const std::string& finding) {
@@ -36,7 +36,8 @@ protected:
 };
 
 TEST_F(ProductVerbs, InfoKnowsEveryBundledScene) {
-    for (const std::string& scene : test::scenes()) {
+    for (const std::string& name : test::scenes()) {
+        const std::string scene = test::scene_file(name);
         const test::Finished text = test::quo({"info", scene}), json = test::quo({"info", scene, "--json"});
         ASSERT_EQ(text.exit_status, 0) << text.err;
         for (const char* fact : {"orbit direction", "look side", "PRF", "wavelength", "corners", "objects"}) {
@@ -50,8 +51,8 @@ TEST_F(ProductVerbs, InfoKnowsEveryBundledScene) {
 }
 
 TEST_F(ProductVerbs, ValidateHasNoErrorInTheBundledScenes) {
-    for (const std::string& scene : test::scenes()) {
-        const test::Finished finished = test::quo({"validate", scene});
+    for (const std::string& name : test::scenes()) {
+        const test::Finished finished = test::quo({"validate", test::scene_file(name)});
         EXPECT_EQ(finished.exit_status, 0) << finished.out;
         EXPECT_THAT(finished.out, HasSubstr("0 errors"));
     }
@@ -147,8 +148,8 @@ void expect_ring(const nlohmann::json& ring) {
 }
 
 TEST_F(ProductVerbs, FootprintIsAClosedRing) {
-    for (const std::string& scene : test::scenes()) {
-        const auto geometry = geometry_of(scene);
+    for (const std::string& name : test::scenes()) {
+        const auto geometry = geometry_of(test::scene_file(name));
         EXPECT_EQ(geometry["type"], "Polygon");
         expect_ring(geometry["coordinates"][0]);
     }
