@@ -12,7 +12,6 @@
 #include "quo_base/fft.h"
 #include "quo_base/gen_utils.h"
 #include "quo_base/gr_pt.h"
-#include "quo_base/interp.h"
 #include "quo_base/interp_orb.h"
 #include "quo_base/profile.h"
 
@@ -26,6 +25,7 @@
 #include "quo_base/generalSAR_configuration.h"
 #include "quo_base/generalSARorbit.h"
 #include "quo_base/geo_grid.h"
+#include "quo_base/interp.h"
 #include "quo_base/quorelReport.h"
 #include "quo_base/quorelxml_v2.h"
 #include "quo_base/roi.h"
