@@ -14,7 +14,7 @@
 namespace {
 
 using test::differences, test::fill_product, test::present_in;
-using testing::ElementsAre, testing::Each, testing::HasSubstr, testing::IsEmpty;
+using testing::ElementsAre, testing::HasSubstr, testing::IsEmpty;
 
 class Product : public testing::Test {
 protected:

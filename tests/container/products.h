@@ -13,8 +13,8 @@
 namespace test {
 
 inline std::vector<GSObject> all_objects() {
-    std::vector<GSObject> objects;
-    for (int i = 0; i < GeneralSAR::kObjects; ++i) objects.push_back(static_cast<GSObject>(i));
+    std::vector<GSObject> objects(GeneralSAR::kObjects);
+    for (std::size_t i = 0; i < objects.size(); ++i) objects[i] = static_cast<GSObject>(i);
     return objects;
 }
 inline std::vector<GSObject> present_in(const GeneralSAR& product) {
