@@ -36,8 +36,7 @@ typedef double _Complex dcomplex;
 #endif
 
 /** Marks a printf-like function, so that the compiler checks its callers' arguments. */
-#define QUO_PRINTF_LIKE(format_index, first_argument) \
-    __attribute__((format(printf, format_index, first_argument)))
+#define QUO_PRINTF_LIKE(format_index, first_argument) __attribute__((format(printf, format_index, first_argument)))
 
 /** What the int results of the library mean. */
 enum QuoStatus {

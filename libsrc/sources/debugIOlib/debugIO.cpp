@@ -28,9 +28,7 @@ bool write_whole(std::FILE* stream, const void* data, std::size_t size) {
     return size == 0 || std::fwrite(data, 1, size, stream) == size;
 }
 
-void send_line() {
-    std::fputs(waitbar_line, stderr);
-}
+void send_line() { std::fputs(waitbar_line, stderr); }
 
 // "%f" whatever the locale, cut to the room that the longest float needs.
 void format_progress(float value) {

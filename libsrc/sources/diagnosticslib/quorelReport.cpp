@@ -32,13 +32,9 @@ private:
     char text_[kMessageRoom];
 };
 
-bool report_is_open() noexcept {
-    return ckflg_report() >= 1;
-}
+bool report_is_open() noexcept { return ckflg_report() >= 1; }
 
-void add_plain(int kind, const char* text) noexcept {
-    quo_add_report(text, kind, 0, kUnknown, kUnknown);
-}
+void add_plain(int kind, const char* text) noexcept { quo_add_report(text, kind, 0, kUnknown, kUnknown); }
 
 int whole_percent(float percentage) noexcept {
     if (std::isnan(percentage)) return 0;
@@ -72,9 +68,7 @@ char quorelReport::reportFilename[512];
 char quorelReport::logFilename[512];
 char quorelReport::progressFilename[512];
 
-quorelReport::quorelReport() noexcept {
-    init_ckerr_locking();
-}
+quorelReport::quorelReport() noexcept { init_ckerr_locking(); }
 
 quorelReport::quorelReport(const char* name, int level) noexcept {
     init_ckerr_locking();
@@ -126,9 +120,7 @@ void quorelReport::checkErrno(int line, const char* function, const char* file) 
     errno = 0;
 }
 
-void quorelReport::end_report() noexcept {
-    addEntry(QUO_CHECKPOINT, "End of processing");
-}
+void quorelReport::end_report() noexcept { addEntry(QUO_CHECKPOINT, "End of processing"); }
 
 void quorelReport::addLog(const char* format, ...) noexcept {
     if (!report_is_open()) return;
@@ -147,9 +139,7 @@ void quorelReport::setLevel(int level) noexcept {
     }
 }
 
-int quorelReport::getLevel() const noexcept {
-    return ckflg_report();
-}
+int quorelReport::getLevel() const noexcept { return ckflg_report(); }
 
 void quorelReport::setReportName(const char* name) noexcept {
     if (reportFilename[0] != '\0') {
@@ -161,9 +151,7 @@ void quorelReport::setReportName(const char* name) noexcept {
     init_report(reportFilename, kTitle, kDefaultLevel);
 }
 
-const char* quorelReport::getReportName() const noexcept {
-    return reportFilename;
-}
+const char* quorelReport::getReportName() const noexcept { return reportFilename; }
 
 void quorelReport::setLogName(const char* name) noexcept {
     quo::copy_bounded(logFilename, quo::text_or_empty(name));

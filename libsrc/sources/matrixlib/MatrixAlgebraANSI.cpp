@@ -13,9 +13,7 @@
 
 namespace quo {
 
-void say(const char* message) noexcept {
-    std::fputs(message, stderr);
-}
+void say(const char* message) noexcept { std::fputs(message, stderr); }
 
 }  // namespace quo
 
@@ -28,9 +26,7 @@ using quo::subtract_multiple;
 // What a zero pivot becomes, so that a matrix that is singular to rounding still has factors.
 constexpr double kTinyPivot = 1e-20;
 
-std::size_t square(int n) {
-    return static_cast<std::size_t>(n) * static_cast<std::size_t>(n);
-}
+std::size_t square(int n) { return static_cast<std::size_t>(n) * static_cast<std::size_t>(n); }
 
 // scale[i] = 1 / the largest magnitude in row i. False when a row is zero or not finite.
 template <typename Matrix>
@@ -245,17 +241,13 @@ std::pair<double, double> make_reflection(const Rows& a, int n, int j) {
     return {length * a[j][j], -scale * length};
 }
 
-double dot3(const double* a, const double* b) {
-    return a[0] * b[0] + a[1] * b[1] + a[2] * b[2];
-}
+double dot3(const double* a, const double* b) { return a[0] * b[0] + a[1] * b[1] + a[2] * b[2]; }
 
 }  // namespace
 
 extern "C" {
 
-int InvMatrix(double** a, double** y, int n) noexcept {
-    return tracked_invert(Rows{a}, Rows{y}, n);
-}
+int InvMatrix(double** a, double** y, int n) noexcept { return tracked_invert(Rows{a}, Rows{y}, n); }
 
 int MatInv(const double* a, double* y, int n) noexcept {
     quo::CallFrame frame{"MatInv", quo::kMatrixSource};
@@ -317,9 +309,7 @@ void lubksb(double** a, int n, const int* indx, double* b) noexcept {
     }
 }
 
-int gaussj(double** a, int n, double** b, int m) noexcept {
-    return tracked_gauss_jordan("gaussj", a, n, b, m);
-}
+int gaussj(double** a, int n, double** b, int m) noexcept { return tracked_gauss_jordan("gaussj", a, n, b, m); }
 int ldgaussj(double** a, int n, double** b, int m) noexcept {
     return tracked_gauss_jordan("ldgaussj", a, n, b, m);
 }
@@ -418,18 +408,14 @@ void mul3x3(const double* a, const double* b, double* out) noexcept {
     std::copy_n(product, 9, out);
 }
 
-void mul(const double* a, const double* b, double* out) noexcept {
-    mul3x3(a, b, out);
-}
+void mul(const double* a, const double* b, double* out) noexcept { mul3x3(a, b, out); }
 
 void mul3x1(const double* a, const double* v, double* out) noexcept {
     const double product[3] = {dot3(a, v), dot3(a + 3, v), dot3(a + 6, v)};
     std::copy_n(product, 3, out);
 }
 
-void mul_NxM_M(const double* a, const double* v, double* out) noexcept {
-    mul3x1(a, v, out);
-}
+void mul_NxM_M(const double* a, const double* v, double* out) noexcept { mul3x1(a, v, out); }
 
 void tran(const double* m, double* out) noexcept {
     const double transposed[9] = {m[0], m[3], m[6], m[1], m[4], m[7], m[2], m[5], m[8]};

@@ -43,10 +43,16 @@ T* block_of(T* pointer, int low) {
     return moved_by(pointer, std::int64_t{low} - 1);
 }
 
+// Bytes of a block of `length` elements and one of slack, or nothing when they cannot be expressed.
+template <typename T>
+std::optional<std::int64_t> block_bytes(Count length) {
+    return ((length + 1) * kElement<T>).value();
+}
+
 // A block of `length` elements and one of slack before them.
 template <typename T>
 T* make_block(Count length) {
-    const auto bytes = ((length + 1) * kElement<T>).value();
+    const auto bytes = block_bytes<T>(length);
     return bytes ? static_cast<T*>(malloc_ckerr(static_cast<std::size_t>(*bytes))) : nullptr;
 }
 
@@ -84,7 +90,8 @@ T** make_matrix(const char* name, int nrl, int nrh, int ncl, int nch) {
         quo::CallFrame frame{name, kSource};
         const auto rows = range_length(nrl, nrh);
         const auto columns = range_length(ncl, nch);
-        if (!rows || !columns || *rows < 1) return nullptr;
+        // The data's size is looked at first, so that no row pointers are made for what cannot be.
+        if (!rows || !columns || *rows < 1 || !block_bytes<T>(Count{*rows} * *columns)) return nullptr;
         T** row_block = make_block<T*>(*rows);
         T* data = row_block ? make_block<T>(Count{*rows} * *columns) : nullptr;
         if (!data) return nullptr;
@@ -176,6 +183,7 @@ float*** f3tensor(int nrl, int nrh, int ncl, int nch, int ndl, int ndh) noexcept
         const auto depths = range_length(ndl, ndh);
         if (!rows || !columns || !depths || *rows < 1 || *columns < 1) return nullptr;
         const Count row_count = Count{*rows} * *columns;
+        if (!block_bytes<float>(row_count * *depths)) return nullptr;
         float*** top = make_block<float**>(*rows);
         float** row_block = top ? make_block<float*>(row_count) : nullptr;
         float* data = row_block ? make_block<float>(row_count * *depths) : nullptr;
