@@ -85,7 +85,7 @@ TEST_P(Fft, LongForwardTransformsAreWithinTheBound) {
     for (const int n : {1080, 4096, 4099, 5760, 65537}) expect_within_bound(n, n);
 }
 
-/** An image larger than the part that is transformed. Sizes above 2048 rows go through a tile. */
+/** An image larger than the part that is transformed. Columns of 256 rows and more go through a tile of 64. */
 struct Shape {
     int n, nfft, m, mfft;
 };

@@ -2,7 +2,9 @@
 #include <dlfcn.h>
 
 #include <array>
+#include <map>
 #include <new>
+#include <type_traits>
 
 #include "signallib/fft_engine.h"
 
@@ -123,21 +125,27 @@ private:
 };
 
 FftEngine* open_mkl(const char* file) {
+    // One for each library, never unloaded: plans may outlive every other object.
+    static auto& engines = *new std::map<void*, MklEngine>;
     void* library = dlopen(file, RTLD_NOW | RTLD_LOCAL);
     if (!library) return nullptr;
-    std::unique_ptr<MklEngine> engine{new (std::nothrow) MklEngine};
-    if (engine && engine->bind(library)) return engine.release();  // for good, as is the library
+    const auto [entry, fresh] = engines.try_emplace(library);
+    if (fresh && entry->second.bind(library)) return &entry->second;
     dlclose(library);
+    if (!fresh) return &entry->second;
+    engines.erase(entry);
     return nullptr;
 }
 
 }  // namespace
 
-FftEngine* load_mkl_engine(const char* file) noexcept {
+FftEngine* load_mkl_engine(const char* file) noexcept try {
     if (file) return open_mkl(file);
     for (const char* name : {"libmkl_rt.so", "libmkl_rt.so.1", "libmkl_rt.so.2"})
         if (FftEngine* engine = open_mkl(name)) return engine;
     return nullptr;
+} catch (...) {
+    return nullptr;  // out of memory
 }
 
 }  // namespace quo
