@@ -84,7 +84,7 @@ std::unique_ptr<GeneralSAR> make_product(int polynomials) {
 }
 
 std::string header(int polynomials) {
-    const std::string file = folder().file("product" + std::to_string(polynomials) + ".hdr");
+    std::string file = folder().file("product" + std::to_string(polynomials) + ".hdr");
     if (!std::filesystem::exists(file)) make_product(polynomials)->GSwrite(file.c_str());
     return file;
 }

@@ -41,7 +41,7 @@ std::string profile(SwathInfo& swath, std::int32_t changes, const std::string& v
 class SwathFile : public testing::Test {
 protected:
     std::string file(const std::string& content) {
-        const std::string name = report_.file("header" + std::to_string(++files_));
+        std::string name = report_.file("header" + std::to_string(++files_));
         test::write_text(name, content);
         return name;
     }
@@ -141,7 +141,7 @@ protected:
             MjdRecord record{};
             if (first) sec852mjd(time_of(line / kLines), &record);
             bytes.append(reinterpret_cast<const char*>(&record), sizeof record).append("flags");
-            bytes.append(static_cast<std::size_t>(kSamples * raster.element_sizeof()), 's');
+            bytes.append(std::size_t{kSamples} * static_cast<std::size_t>(raster.element_sizeof()), 's');
         }
         test::write_text(name_, bytes);
         ASSERT_EQ(raster.write_hdr(), 0);
