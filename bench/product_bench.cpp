@@ -120,13 +120,13 @@ void build(xmlNode* parent, const xmlNode* model) {
 void read_product(benchmark::State& state) {
     const std::string file = header(static_cast<int>(state.range(0)));
     GeneralSAR product;
-    for (auto _ : state) benchmark::DoNotOptimize(product.GSread(file.c_str()));
+    for ([[maybe_unused]] auto _ : state) benchmark::DoNotOptimize(product.GSread(file.c_str()));
     if (product.polynomials.nsl2phi != state.range(0)) state.SkipWithError("product not read");
 }
 
 void parse_and_walk(benchmark::State& state) {
     const std::string file = header(static_cast<int>(state.range(0)));
-    for (auto _ : state) {
+    for ([[maybe_unused]] auto _ : state) {
         xmlDoc* tree = parse(file);
         benchmark::DoNotOptimize(walk(tree->children));
         xmlFreeDoc(tree);
@@ -136,7 +136,7 @@ void parse_and_walk(benchmark::State& state) {
 void write_product(benchmark::State& state) {
     const std::string file = folder().file("written.hdr");
     const auto product = make_product(static_cast<int>(state.range(0)));
-    for (auto _ : state) {
+    for ([[maybe_unused]] auto _ : state) {
         state.PauseTiming();
         std::filesystem::remove(file);
         state.ResumeTiming();
@@ -148,7 +148,7 @@ void build_and_save(benchmark::State& state) {
     const std::string file = folder().file("built.hdr");
     xmlDoc* model = parse(header(static_cast<int>(state.range(0))));
     const xmlNode* root = xmlDocGetRootElement(model);
-    for (auto _ : state) {
+    for ([[maybe_unused]] auto _ : state) {
         xmlDoc* tree = xmlNewDoc(reinterpret_cast<const xmlChar*>("1.0"));
         xmlNode* made = xmlNewDocNode(tree, nullptr, root->name, nullptr);
         xmlDocSetRootElement(tree, made);

@@ -7,6 +7,7 @@
 #include <complex>
 #include <cstdlib>
 #include <numbers>
+#include <ostream>
 #include <random>
 #include <string>
 #include <vector>
@@ -42,6 +43,7 @@ public:
 struct EngineChoice {
     const char *name, *choice, *mkl;
 };
+inline void PrintTo(const EngineChoice& engine, std::ostream* out) { *out << engine.name; }
 inline constexpr EngineChoice kEngines[] = {
     {"Fftw", "fftw", ""}, {"DftiStandIn", "mkl", QUO_TEST_FAKE_DFTI}, {"Mkl", "mkl", ""}};
 

@@ -120,13 +120,20 @@ TEST_P(Fft, RowsAndColumnsTransformTheirPartOfTheImageOnly) {
             ASSERT_EQ(fft_c(s.n, s.nfft, s.m, s.mfft, dir_rows, dir_cols, inside.data(), inside.data()), 0);
             EXPECT_LE(relative_error(inside, *expected), bound(s.nfft * s.mfft + 1));
             ASSERT_EQ(fft_c(s.n, s.nfft, s.m, s.mfft, dir_rows, dir_cols, in.data(), apart.data()), 0);
+            // In place and apart may be planned differently, so that they agree to rounding only.
             const bool skipped = (dir_rows == 0 || s.nfft == 1) && (dir_cols == 0 || s.mfft == 1);
+            Samples taken_apart, taken_inside;
             for (int row = 0; row < s.m; ++row)
                 for (int k = 0; k < s.n; ++k) {
                     const auto at = static_cast<std::size_t>(row * s.n + k);
-                    const bool taken = !skipped && row < s.mfft && k < s.nfft;
-                    ASSERT_EQ(apart[at], taken ? inside[at] : fcomplex{-999.0F}) << row << " " << k;
+                    if (!skipped && row < s.mfft && k < s.nfft) {
+                        taken_apart.push_back(apart[at]);
+                        taken_inside.push_back(inside[at]);
+                    } else {
+                        ASSERT_EQ(apart[at], fcomplex{-999.0F}) << row << " " << k;
+                    }
                 }
+            EXPECT_LE(relative_error(taken_apart, taken_inside), bound(s.nfft * s.mfft + 1));
         }
     }
 }
