@@ -6,56 +6,21 @@
 
 #include <csignal>
 #include <string>
+#include <utility>
 
 #include "header_files.h"
 #include "quorelxmllib/header_session.h"
 #include "shelf.h"
+#include "support/limits.h"
 
 namespace {
 
+using test::FileSizeLimit;
+using test::OrdinaryUser;
 using test::read_text;
 using test::Shelf;
 using test::write_text;
 using testing::ElementsAre;
-
-/** Files cannot grow beyond so many bytes: what a full disk looks like to a writer. */
-class FileSizeLimit {
-public:
-    explicit FileSizeLimit(std::size_t bytes) {
-        handler_ = std::signal(SIGXFSZ, SIG_IGN);
-        getrlimit(RLIMIT_FSIZE, &before_);
-        const rlimit limit{bytes, before_.rlim_max};
-        setrlimit(RLIMIT_FSIZE, &limit);
-    }
-    ~FileSizeLimit() {
-        setrlimit(RLIMIT_FSIZE, &before_);
-        std::signal(SIGXFSZ, handler_);
-        errno = 0;
-    }
-    FileSizeLimit(const FileSizeLimit&) = delete;
-    FileSizeLimit& operator=(const FileSizeLimit&) = delete;
-
-private:
-    rlimit before_{};
-    void (*handler_)(int);
-};
-
-/** The rights of an ordinary user, also where the tests run as the administrator. */
-class OrdinaryUser {
-public:
-    OrdinaryUser() : before_{geteuid()} {
-        if (before_ == 0 && seteuid(65534) != 0) throw std::runtime_error("cannot give up rights");
-    }
-    ~OrdinaryUser() {
-        if (seteuid(before_) != 0) std::abort();
-        errno = 0;
-    }
-    OrdinaryUser(const OrdinaryUser&) = delete;
-    OrdinaryUser& operator=(const OrdinaryUser&) = delete;
-
-private:
-    uid_t before_;
-};
 
 using Save = int (*)(Shelf& object, const char* file);
 int by_object(Shelf& object, const char* file) { return object.writeAuxiliaryFile(file, 1, "Shelf"); }
@@ -126,18 +91,11 @@ TEST_P(FailedSave, RefusesFoldersDevicesAndPlacesThatAreNotThere) {
 }
 
 TEST_P(FailedSave, RespectsFilesAndFoldersThatMayNotBeWritten) {
-    ASSERT_EQ(chmod(folder_.path().c_str(), 0777), 0);
-    ASSERT_EQ(chmod(file_.c_str(), 0444), 0);
-    {
+    for (const auto& [file_mode, folder_mode] : {std::pair{0444, 0777}, {0666, 0555}}) {
+        ASSERT_EQ(chmod(file_.c_str(), static_cast<mode_t>(file_mode)), 0);
+        ASSERT_EQ(chmod(folder_.path().c_str(), static_cast<mode_t>(folder_mode)), 0);
         const OrdinaryUser user;
-        test::CapturedStderr quiet;
-        EXPECT_EQ(GetParam().save(object_, file_.c_str()), 1);
-    }
-    ASSERT_EQ(chmod(file_.c_str(), 0666), 0);
-    ASSERT_EQ(chmod(folder_.path().c_str(), 0555), 0);
-    {
-        const OrdinaryUser user;
-        test::CapturedStderr quiet;
+        const test::CapturedStderr quiet;
         EXPECT_EQ(GetParam().save(object_, file_.c_str()), 1);
     }
     EXPECT_EQ(read_text(file_), old_);

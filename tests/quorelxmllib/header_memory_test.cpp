@@ -2,68 +2,23 @@
 #include <libxml/xmlmemory.h>
 
 #include <cstdlib>
+#include <cstring>
 #include <new>
 #include <string>
 
 #include "header_files.h"
 #include "quorelxmllib/header_session.h"
 #include "shelf.h"
+#include "support/failing_new.h"
 
 namespace {
 
-/** How many allocations still succeed, of the program and of libxml2 together; none is counted while negative. */
-long allowed = -1;
-/** Whether one allocation fails, or all from then on. */
-bool only_one = false;
-bool has_failed = false;
-
-bool refused() {
-    if (allowed < 0) return false;
-    if (allowed > 0) {
-        --allowed;
-        return false;
-    }
-    has_failed = true;
-    if (only_one) allowed = -1;
-    return true;
+// libxml2 shares the room of the program.
+void* xml_malloc(std::size_t size) { return test::is_refused() ? nullptr : std::malloc(size); }
+void* xml_realloc(void* block, std::size_t size) {
+    return test::is_refused() ? nullptr : std::realloc(block, size);
 }
-
-/** Makes the allocation after the next `room` fail, and those after it as well or not. */
-void start_failing(long room, bool once) {
-    has_failed = false;
-    only_one = once;
-    allowed = room;
-}
-/** Whether any allocation failed. */
-bool stop_failing() {
-    allowed = -1;
-    errno = 0;
-    return has_failed;
-}
-
-void* xml_malloc(std::size_t size) { return refused() ? nullptr : std::malloc(size); }
-void* xml_realloc(void* block, std::size_t size) { return refused() ? nullptr : std::realloc(block, size); }
-char* xml_strdup(const char* text) { return refused() ? nullptr : strdup(text); }
-
-}  // namespace
-
-void* operator new(std::size_t size) {
-    if (refused()) throw std::bad_alloc{};
-    if (void* const block = std::malloc(size ? size : 1)) return block;
-    throw std::bad_alloc{};
-}
-void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
-    return refused() ? nullptr : std::malloc(size ? size : 1);
-}
-void* operator new[](std::size_t size) { return operator new(size); }
-void* operator new[](std::size_t size, const std::nothrow_t& tag) noexcept { return operator new(size, tag); }
-// Inlined, the pairs of these and the operators above would look mismatched to the compiler.
-[[gnu::noinline]] void operator delete(void* block) noexcept { std::free(block); }
-[[gnu::noinline]] void operator delete(void* block, std::size_t) noexcept { std::free(block); }
-[[gnu::noinline]] void operator delete[](void* block) noexcept { std::free(block); }
-[[gnu::noinline]] void operator delete[](void* block, std::size_t) noexcept { std::free(block); }
-
-namespace {
+char* xml_strdup(const char* text) { return test::is_refused() ? nullptr : strdup(text); }
 
 using test::read_text;
 using test::Shelf;
@@ -118,13 +73,13 @@ TEST_P(HeaderMemory, LeavesTheOldFileOrTheCompleteNewOne) {
     long successes = 0;
     for (long room = 0; room < 20000; ++room) {
         write_text(file, old);
-        start_failing(room, once);
+        test::fail_news(room, test::News::kAll, once);
         try {
             status = job.run(object, file.c_str());
         } catch (const std::bad_alloc&) {
             status = 7;  // only the session's own construction may throw
         }
-        const bool failed = stop_failing();
+        const bool failed = test::stop_failing();
         EXPECT_TRUE(status == 0 || status == 1 || status == 7) << room;
         const std::string now = read_text(file);
         EXPECT_TRUE(now == (status == 0 ? complete : old)) << room << ": " << status << now;
@@ -158,10 +113,10 @@ TEST(HeaderMemoryRead, GivesTheWholeObjectOrAFailure) {
     for (long room = 0; room < 20000; ++room) {
         Shelf object, copy;
         object.fill(5);
-        start_failing(room, room % 2 == 0);
+        test::fail_news(room, test::News::kAll, room % 2 == 0);
         read = object.readAuxiliaryFile(file.c_str(), 1, "Shelf");
         const int cloned = read ? whole.clone(&copy) : 0;
-        const bool failed = stop_failing();
+        const bool failed = test::stop_failing();
         EXPECT_TRUE(!read || object == whole) << room;
         EXPECT_TRUE(cloned == 7 || !read || copy == whole) << room;
         if (!failed) break;

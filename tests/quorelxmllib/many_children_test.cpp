@@ -29,37 +29,31 @@ protected:
     std::string any_name() { return "child" + std::to_string(random_() % kNames); }
     static std::string path(const std::string& name) { return "Set/" + name; }
 
-    void write_one() {
-        const std::string name = any_name();
-        const std::int32_t value = static_cast<std::int32_t>(random_() % 1000000);
-        ASSERT_EQ(document_.writeInt(1, path(name).c_str(), &value, 1), 0);
-        const auto found = std::ranges::find(model_, name, &Model::value_type::first);
-        if (found == model_.end())
-            model_.emplace_back(name, value);
-        else
-            found->second = value;
+    /** Writes one, appends copies of one, or removes all of one name. */
+    void change_one(unsigned choice) {
+        const std::string name = any_name(), field = path(name);
+        const int present = count_of(model_, name);
+        if (choice < 300) {
+            const auto value = static_cast<std::int32_t>(random_() % 1000000);
+            ASSERT_EQ(document_.writeInt(1, field.c_str(), &value, 1), 0);
+            if (present == 0) model_.emplace_back(name, value);
+            std::ranges::find(model_, name, &Model::value_type::first)->second = value;
+        } else if (choice < 340) {
+            ASSERT_EQ(document_.createField(1, field.c_str(), present + 2), 0);
+            model_.insert(model_.end(), 2, {name, 0});
+        } else {
+            ASSERT_EQ(document_.clearField(1, field.c_str()), 0);
+            std::erase_if(model_, [&](const auto& child) { return child.first == name; });
+        }
     }
-    void append_copies() {
-        const std::string name = any_name();
-        const int wanted = count_of(model_, name) + 2;
-        ASSERT_EQ(document_.createField(1, path(name).c_str(), wanted), 0);
-        for (int present = count_of(model_, name); present < wanted; ++present) model_.emplace_back(name, 0);
-    }
-    void clear_one() {
-        const std::string name = any_name();
-        ASSERT_EQ(document_.clearField(1, path(name).c_str()), 0);
-        std::erase_if(model_, [&](const auto& child) { return child.first == name; });
-    }
-    void clear_all() {
+    // An element with children of its own may become one with a text: what was below it is gone.
+    void clear_all(bool by_text) {
+        const char* text = "nothing";
+        if (by_text) {
+            ASSERT_EQ(document_.writeString(1, "Set", &text, 1), 0);
+        }
         ASSERT_EQ(document_.clearField(1, "Set"), 0);
         model_.clear();
-    }
-    // An element with children of its own becomes one with a text: what was below it is gone.
-    void replace_by_text() {
-        const char* text = "nothing";
-        ASSERT_EQ(document_.writeString(1, "Set", &text, 1), 0);
-        model_.clear();
-        clear_all();
     }
     // Texts beside elements make a save load the tree once more.
     void save_with_mixed_content() {
@@ -85,18 +79,9 @@ protected:
 TEST_P(ManyChildren, AreFoundWhateverCameAndWent) {
     for (int step = 0; step < kSteps; ++step) {
         const auto choice = random_() % 1000;
-        if (choice < 300)
-            write_one();
-        else if (choice < 340)
-            append_copies();
-        else if (choice < 440)
-            clear_one();
-        else if (choice < 442)
-            clear_all();
-        else if (choice < 443)
-            replace_by_text();
-        else if (choice < 446)
-            save_with_mixed_content();
+        if (choice < 440) change_one(static_cast<unsigned>(choice));
+        if (choice >= 440 && choice < 443) clear_all(choice == 442);
+        if (choice >= 443 && choice < 446) save_with_mixed_content();
         look_up();
         ASSERT_FALSE(HasFailure()) << "step " << step;
     }
