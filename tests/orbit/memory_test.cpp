@@ -1,45 +1,16 @@
 #include <gtest/gtest.h>
 
-#include <cstdlib>
-#include <new>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
 #include "orbit/made_orbits.h"
 #include "support/diagnostics.h"
+#include "support/failing_new.h"
 #include "support/geometry.h"
 
 // Every allocation that an orbit makes fails in turn. The arrays of an object come from the operators that return
 // null; of those that throw, only SVCheck's list of findings is under test.
-
-namespace {
-
-long nulls_allowed = -1, throws_allowed = -1;  // how many allocations still succeed; all while negative
-
-bool refused(long& allowed) {
-    if (allowed > 0) --allowed;
-    return allowed == 0;
-}
-
-}  // namespace
-
-// Never inlined: the compiler would take the malloc and free inside for a mismatch.
-[[gnu::noinline]] void* operator new(std::size_t size) {
-    if (!refused(throws_allowed))
-        if (void* const block = std::malloc(size ? size : 1)) return block;
-    throw std::bad_alloc{};
-}
-[[gnu::noinline]] void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
-    return refused(nulls_allowed) ? nullptr : std::malloc(size ? size : 1);
-}
-[[gnu::noinline]] void* operator new[](std::size_t size) { return operator new(size); }
-[[gnu::noinline]] void* operator new[](std::size_t size, const std::nothrow_t& tag) noexcept {
-    return operator new(size, tag);
-}
-[[gnu::noinline]] void operator delete(void* block) noexcept { std::free(block); }
-[[gnu::noinline]] void operator delete(void* block, std::size_t) noexcept { std::free(block); }
-[[gnu::noinline]] void operator delete[](void* block) noexcept { std::free(block); }
-[[gnu::noinline]] void operator delete[](void* block, std::size_t) noexcept { std::free(block); }
 
 namespace {
 
@@ -77,16 +48,16 @@ INSTANTIATE_TEST_SUITE_P(Of, Allocations, testing::ValuesIn(kJobs),
                          [](const auto& row) { return row.param.name; });
 
 TEST_P(Allocations, FailWithSevenAndWithoutHalves) {
-    for (long allowed = 1; allowed < 50; ++allowed) {
+    for (long room = 0; room < 50; ++room) {
         Desk desk;
-        nulls_allowed = allowed;
+        test::fail_news(room, test::News::kReturningNull);
         const int status = GetParam().run(desk);
-        nulls_allowed = -1;
+        test::stop_failing();
         if (status == 0) {
-            EXPECT_GT(allowed, 2) << "nothing was refused";
+            EXPECT_GT(room, 1) << "nothing was refused";
             return;
         }
-        SCOPED_TRACE("allocation " + std::to_string(allowed));
+        SCOPED_TRACE("room for " + std::to_string(room));
         EXPECT_EQ(status, QUO_NO_MEMORY);
         EXPECT_EQ(desk.empty.pSV_m, nullptr);
         EXPECT_EQ(desk.empty.vSV_mOs, nullptr);
@@ -104,10 +75,10 @@ TEST(Allocations, OfTheFindingsFailWithSeven) {
     Desk desk;
     desk.full.pSV_m[7] += 5.0;
     int status = QUO_NO_MEMORY;
-    for (long allowed = 1; status && allowed < 50; ++allowed) {
-        throws_allowed = allowed;
+    for (long room = 0; status && room < 50; ++room) {
+        test::fail_news(room, test::News::kThrowing);
         status = desk.full.SVCheck(desk.findings);
-        throws_allowed = -1;
+        test::stop_failing();
         EXPECT_TRUE(status == 0 || (status == QUO_NO_MEMORY && desk.findings.empty()));
     }
     EXPECT_EQ(status, 0);

@@ -1,0 +1,54 @@
+#ifndef QUO_TESTS_SUPPORT_LIMITS_H
+#define QUO_TESTS_SUPPORT_LIMITS_H
+
+#include <sys/resource.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <csignal>
+#include <cstdlib>
+#include <stdexcept>
+
+namespace test {
+
+/** No file can grow beyond so many bytes: what a full disk looks like to a writer. */
+class FileSizeLimit {
+public:
+    explicit FileSizeLimit(rlim_t bytes) : handler_{std::signal(SIGXFSZ, SIG_IGN)} {
+        getrlimit(RLIMIT_FSIZE, &before_);
+        const rlimit limit{bytes, before_.rlim_max};
+        setrlimit(RLIMIT_FSIZE, &limit);
+    }
+    ~FileSizeLimit() {
+        setrlimit(RLIMIT_FSIZE, &before_);
+        (void)std::signal(SIGXFSZ, handler_);
+        errno = 0;
+    }
+    FileSizeLimit(const FileSizeLimit&) = delete;
+    FileSizeLimit& operator=(const FileSizeLimit&) = delete;
+
+private:
+    void (*handler_)(int);
+    rlimit before_{};
+};
+
+/** The rights of an ordinary user, also where the tests run as the administrator. */
+class OrdinaryUser {
+public:
+    OrdinaryUser() : before_{geteuid()} {
+        if (before_ == 0 && seteuid(65534) != 0) throw std::runtime_error("cannot give up rights");
+    }
+    ~OrdinaryUser() {
+        if (seteuid(before_) != 0) std::abort();
+        errno = 0;
+    }
+    OrdinaryUser(const OrdinaryUser&) = delete;
+    OrdinaryUser& operator=(const OrdinaryUser&) = delete;
+
+private:
+    uid_t before_;
+};
+
+}  // namespace test
+
+#endif
