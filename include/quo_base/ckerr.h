@@ -74,7 +74,8 @@ QUO_BASE_API void exit_ckerr(void) QUO_NOEXCEPT;
  *         success from failure, ask ckflg_report(). */
 QUO_BASE_API int init_report(const char* file_name, const char* title, int level) QUO_NOEXCEPT;
 
-/** Opens the log, as init_report() does the report; nothing is written.
+/** Opens the log, as init_report() does the report: the file is created or emptied, but nothing written. A failure
+ * leaves the shared title and start time as they are.
  * @return 1 when the log has been opened; otherwise as init_report(), of the log's level. */
 QUO_BASE_API int init_log(const char* file_name, const char* title, int level) QUO_NOEXCEPT;
 
@@ -124,7 +125,8 @@ QUO_BASE_API int quo_add_log(const char* text) QUO_NOEXCEPT;
 QUO_BASE_API void* malloc_ckerr(size_t size) QUO_NOEXCEPT;
 
 /** As malloc_ckerr(), for `count` elements of `size` bytes, zero-filled. A product that overflows counts as
- * refused by the system. */
+ * refused by the system.
+ * @return the block, owned by the caller, or null as there */
 QUO_BASE_API void* calloc_ckerr(size_t count, size_t size) QUO_NOEXCEPT;
 
 /** Frees a block. While tracking is on, a block that is not in the table is neither freed nor reported
@@ -138,10 +140,10 @@ QUO_BASE_API void free_ckerr(void* block) QUO_NOEXCEPT;
 QUO_BASE_API void freeall_ckerr(void) QUO_NOEXCEPT;
 
 /** Allocates a matrix as separate rows, zero-filled.
- * @return an array of `rows` pointers to rows of `row_bytes`, to be freed with matfree_ckerr(); an empty array for
- * rows below 1; null if any allocation failed. While tracking is on, what was made until then stays, for
- *         freeall_ckerr() to reclaim. */
-QUO_BASE_API void* matalloc_ckerr(int rows, size_t row_bytes) QUO_NOEXCEPT;
+ * @return an array of `rows` pointers to rows of `row_bytes` each, all owned by the caller, to be freed with
+ * matfree_ckerr(); an empty array for rows below 1; null if any allocation failed. While tracking is on, what was
+ * made until then stays, for freeall_ckerr() to reclaim; otherwise it is freed. */
+QUO_BASE_API void** matalloc_ckerr(int rows, size_t row_bytes) QUO_NOEXCEPT;
 
 /** Frees the `rows` rows of a matrix in order, then the array of pointers; of a null array, only that. */
 QUO_BASE_API void matfree_ckerr(void** rows_array, int rows) QUO_NOEXCEPT;

@@ -20,7 +20,8 @@ QUO_BASE_C_BEGIN
  *
  * No function here takes part in the call frames or leaves an entry in the report. Errors are written to the
  * standard error stream where the function's comment says so. Nothing is kept between calls: all of it is
- * reentrant. */
+ * reentrant. A null text or path counts as an empty one where nothing else is said; buffers and records must be
+ * there. */
 
 /* Byte order.
  *
@@ -30,7 +31,7 @@ QUO_BASE_C_BEGIN
 /** Byte-order code of the host: 'l' on every supported one. */
 QUO_BASE_API char endi(void) QUO_NOEXCEPT;
 
-/** The value with its two bytes exchanged. */
+/** The 16-bit value with its two bytes exchanged. */
 QUO_BASE_API uint16_t bsw2b(uint16_t value) QUO_NOEXCEPT;
 
 /** Numbers assembled from 2, 4 or 8 bytes that stand in the given order. */
@@ -171,8 +172,8 @@ QUO_BASE_API int myfseek64_msc(FILE* stream, int64_t offset64, int whence) QUO_N
 /** Removes one final slash or backslash in place. Returns the length before that. */
 QUO_BASE_API int check_fsep(char* path) QUO_NOEXCEPT;
 
-/** Points behind the last slash; behind the last backslash only when there is no slash at all; else at the path
- * itself. Deliberate: a backslash after the last slash belongs to the name. */
+/** Points into `path`: behind the last slash; behind the last backslash only when there is no slash at all; else
+ * at its begin. Null for null. Deliberate: a backslash after the last slash belongs to the name. */
 QUO_BASE_API const char* getFileNameFromPath(const char* path) QUO_NOEXCEPT;
 
 /** Copies a whole file. Always 0: deliberate, nothing is checked or reported. When the source cannot be read or

@@ -102,6 +102,8 @@ QUO_BASE_API int WriteMyProfileStringQuote(const char* section, const char* key,
 
 /** Reads `count` strings, each into `strings[i]` of `room` bytes, cut to room - 1.
  *
+ * Strings that are not read keep their content; a room below 1 leaves all as they are.
+ *
  * @return 0 when all are read; 10 as above. Kept as callers know it: a closing brace before `count` strings
  * returns the number read so far, unreported; a value without an opening brace, and any other character than a
  * blank between the strings, ends the reading with 0. */
@@ -218,8 +220,9 @@ QUO_BASE_API void GetCheckMyProfileDoubleArray(const char* section, const char* 
 
 /* ---- Short forms ----
  *
- * The arguments in another order; `ignored` is not used. The Set forms write and then call SyncProfile(file), so
- * that the change is on the disk at once; they return the status of the write, not of the sync. */
+ * The arguments in another order; `ignored` is not used. All return 0 or 10 as the functions above do, and leave
+ * the same unchanged. The Set forms write and then call SyncProfile(file), so that the change is on the disk at
+ * once; they return the status of the write, not of the sync. */
 
 /** Reads a string into `buffer` of 512 bytes; `count` is not used. */
 QUO_BASE_API int GetParString(const char* file, const char* key, int count, char* buffer, int ignored,

@@ -243,7 +243,7 @@ TEST_F(Tracked, LeakReportCountsTo65535) {
 TEST_F(Tracked, MatrixRowsAreZeroFilledAndGoTogether) {
     for (const bool tracking : {true, false}) {
         if (!tracking) exit_ckerr();
-        auto** rows = static_cast<void**>(matalloc_ckerr(17, 33));
+        void** rows = matalloc_ckerr(17, 33);
         ASSERT_NE(rows, nullptr);
         for (int row = 0; row < 17; ++row) {
             auto* bytes = static_cast<char*>(rows[row]);
@@ -256,9 +256,9 @@ TEST_F(Tracked, MatrixRowsAreZeroFilledAndGoTogether) {
 
 TEST_F(Tracked, MatrixWithoutRowsIsAnEmptyArray) {
     for (const int rows : {0, -1, INT_MIN}) {
-        void* array = matalloc_ckerr(rows, 10);
+        void** array = matalloc_ckerr(rows, 10);
         EXPECT_NE(array, nullptr);
-        matfree_ckerr(static_cast<void**>(array), rows);
+        matfree_ckerr(array, rows);
     }
     matfree_ckerr(nullptr, 5);
 }

@@ -145,7 +145,7 @@ extern "C" void freeall_ckerr(void) noexcept {
     if (call_stack.tracking) tracked.remove_since(call_stack.running().serial, release_block);
 }
 
-extern "C" void* matalloc_ckerr(int rows, size_t row_bytes) noexcept {
+extern "C" void** matalloc_ckerr(int rows, size_t row_bytes) noexcept {
     const std::size_t count = rows > 0 ? static_cast<std::size_t>(rows) : 0;
     auto** const array =
         static_cast<void**>(allocate(count, sizeof(void*), plain_memory, "matalloc_ckerr", __LINE__));
