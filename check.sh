@@ -10,6 +10,7 @@ run() {
     ctest --output-on-failure --no-tests=error --parallel "$(nproc)" "$@"
 }
 scripts/build.sh release
+build/release/tests/signallib/engines_present
 run --test-dir build/release --label-exclude lint
 scripts/build.sh asan
 run --test-dir build/asan --label-exclude lint

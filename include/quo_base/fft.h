@@ -17,7 +17,8 @@ QUO_BASE_C_BEGIN
  * The transforms are computed by an engine that is loaded when the first plan is made. QUO_FFT_ENGINE names it:
  * "mkl" (libmkl_rt; QUO_MKL_LIBRARY may give its file), "fftw" (the module quo_base/libquo_base_fftw.so beside
  * this library; QUO_FFTW_MODULE may give another file) or "auto", which is the default: MKL on processors of its
- * maker, else FFTW, else whichever can be loaded. Engines run on the caller's thread alone.
+ * maker, else FFTW, else whichever can be loaded; any other value counts as "auto". Engines run on the caller's
+ * thread alone.
  *
  * Making a plan of a new geometry measures, which takes milliseconds to seconds. What was measured is kept for the
  * process (the 32 geometries used last), so that the same plan made again takes well under 2 microseconds.
@@ -129,7 +130,8 @@ QUO_BASE_API int czt_makep_c(CztPlan* plan, int N, int M) QUO_NOEXCEPT;
  * @param[in]  a      first angular frequency, radians per input sample
  * @param[in]  count  0 does nothing
  * @return 0; 1 for null pointers, a plan that was released or never made, a negative count or overlapping buffers;
- * 7 when working memory cannot be had. Nothing is written unless 0 is returned. */
+ * 7 when working memory cannot be had, with nothing written, or when an engine refuses to run, which leaves the
+ * vectors that are done. */
 QUO_BASE_API int pczt_c(const CztPlan* plan, const fcomplex* in, fcomplex* out, double w, double a,
                         int count) QUO_NOEXCEPT;
 

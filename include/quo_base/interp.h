@@ -23,8 +23,8 @@ public:
     /** Makes the plans that interpft_p() runs, for an image of nx_in by ny_in samples that becomes nx_out by
      * ny_out. Plans made before are released. Sizes that do not change need no plans.
      *
-     * @return 0; 1 when both axes change, an axis shrinks or a size is below 1; the status of fft_makep_c(). After
-     * a failure there are no plans and no sizes. */
+     * @return 0; 1 when both axes change, an axis shrinks, a size is below 1 or an image beyond any memory; the
+     * status of fft_makep_c(). After a failure there are no plans and no sizes. */
     int setplans(int nx_in, int ny_in, int nx_out, int ny_out);
 
     /** Releases the plans and forgets the sizes. Returns 0. */
@@ -56,8 +56,8 @@ public:
      * is.
      *
      * @param[out] out  ny_out rows of nx_out, apart from `in`
-     * @return 0, also when nothing grows (nothing is written then); 1 for null pointers, a size below 1, or when
-     * both axes change */
+     * @return 0, also when nothing grows (nothing is written then); 1 for null pointers, a size below 1, an image
+     * beyond any memory, or when one axis grows and the other changes too */
     int interp_lin(const fcomplex* in, int nx_in, int ny_in, int nx_out, int ny_out, fcomplex* out);
     int interp_lin(const float* in, int nx_in, int ny_in, int nx_out, int ny_out, float* out);
     int interp_lin(const double* in, int nx_in, int ny_in, int nx_out, int ny_out, double* out);
@@ -94,8 +94,8 @@ public:
      *
      * @param[in]  in  ny rows of nx samples
      * @param[out] out apart from `in`; unchanged unless 0 is returned
-     * @return 0; 1 for null pointers, nx, ny below 1, a negative count or lowpass outside 1..64; 7 without memory
-     */
+     * @return 0; 1 for null pointers, nx, ny below 1 or an image beyond any memory, a negative count or lowpass
+     * outside 1..64; 7 without memory */
     int interp2(const fcomplex* in, int nx, int ny, const double* x, const double* y, int count, fcomplex* out);
     int interp2(const fcomplex* in, int nx, int ny, const double* x, const double* y, int count, fcomplex* out,
                 int lowpass);

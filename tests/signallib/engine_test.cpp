@@ -91,6 +91,45 @@ TEST(FftwModule, ExportsItsEntryAloneAndRefusesOtherInterfaces) {
     dlclose(module);
 }
 
+struct Loading {
+    const char* name;
+    bool mkl_first;
+    int binding;
+};
+class LoadingOrder : public testing::TestWithParam<Loading> {};
+
+// MKL exports functions of FFTW's names. Whichever the program around us has loaded first, for itself or for all,
+// each engine must keep to its own.
+TEST_P(LoadingOrder, LeavesEachEngineItsOwnFunctions) {
+    std::vector<std::pair<const char*, const char*>> order{{"fftw", "libfftw3f.so.3"}, {"mkl", "libmkl_rt.so"}};
+    if (GetParam().mkl_first) std::swap(order.front(), order.back());
+    for (const auto& [choice, library] : order) {
+        void* const loaded = dlopen(library, RTLD_NOW | GetParam().binding);
+        if (!loaded) GTEST_SKIP() << library << " is not installed here";
+        // MKL takes in its other libraries with the first call.
+        const auto first_call = reinterpret_cast<int (*)()>(dlsym(loaded, "MKL_Get_Max_Threads"));
+        if (first_call) first_call();
+    }
+    constexpr int n = 60, m = 320, x = 7, y = 11;
+    Samples tone(n * m), peak(n * m);
+    for (std::size_t k = 0; k < tone.size(); ++k)
+        tone[k] = fcomplex{test::root(k % n * x, n, 1.0) * test::root(k / n * y, m, 1.0)};
+    peak[y * n + x] = fcomplex{n * m};
+    for (const auto& [choice, library] : order) {
+        const Engine engine{choice, ""};
+        ASSERT_STREQ(fft_engine_name(), choice);
+        Samples spectrum = tone;
+        ASSERT_EQ(fft_c(n, n, m, m, 1, 1, spectrum.data(), spectrum.data()), 0);
+        EXPECT_LE(test::relative_error(spectrum, peak), 1e-6) << choice;
+    }
+}
+INSTANTIATE_TEST_SUITE_P(Host, LoadingOrder,
+                         testing::Values(Loading{"MklFirstLocal", true, RTLD_LOCAL},
+                                         Loading{"MklFirstGlobal", true, RTLD_GLOBAL},
+                                         Loading{"FftwFirstLocal", false, RTLD_LOCAL},
+                                         Loading{"FftwFirstGlobal", false, RTLD_GLOBAL}),
+                         [](const auto& row) { return row.param.name; });
+
 /** Counts what is made of it; makes batches that do nothing. */
 class CountingEngine final : public quo::FftEngine {
 public:

@@ -2,8 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <climits>
 #include <cmath>
-#include <limits>
 
 #include "signallib/engines.h"
 #include "support/diagnostics.h"
@@ -133,20 +133,22 @@ TEST_F(Interp, RefusesWithoutWritingAndSaysSo) {
     EXPECT_EQ(interp_.interpft(in_.data(), 8, 8, 4, 8, out_.data()), 1);
     EXPECT_EQ(interp_.interpft(in_.data(), 0, 8, 0, 8, out_.data()), 1);
     EXPECT_EQ(interp_.interpft(in_.data(), 8, -8, 16, -8, out_.data()), 1);
+    EXPECT_EQ(interp_.interpft(in_.data(), INT_MAX, INT_MAX, INT_MAX, INT_MAX, out_.data()), 1);
     EXPECT_EQ(interp_.interpft(nullptr, 8, 8, 16, 8, out_.data()), 1);
     EXPECT_EQ(interp_.interpft_p(in_.data(), out_.data()), 1) << "no plans";
     ASSERT_EQ(interp_.setplans(8, 8, 16, 8), 0);
     interp_.resetplans();
     EXPECT_EQ(interp_.interpft_p(in_.data(), out_.data()), 1) << "sizes forgotten";
     EXPECT_EQ(interp_.interp_lin(in_.data(), 8, 8, 16, 16, out_.data()), 1);
+    EXPECT_EQ(interp_.interp_lin(in_.data(), 1, INT_MAX, INT_MAX, INT_MAX, out_.data()), 1);
     EXPECT_EQ(in_, before);
     EXPECT_EQ(out_, Samples(256, fcomplex{-999.0F}));
     const auto errors = report.entries("ERROR"), calls = report.entries("ERROR_CALL_TREE");
-    ASSERT_EQ(errors.size(), 8U);
+    ASSERT_EQ(errors.size(), 10U);
     EXPECT_EQ(errors.front().file, kSource);
     EXPECT_EQ(errors.front().function, "interp::setplans");
     EXPECT_EQ(errors.back().function, "interp::interp_lin(fcomplex)");
-    ASSERT_EQ(calls.size(), 5U);
+    ASSERT_EQ(calls.size(), 6U);
     EXPECT_EQ(calls.front().function, "interp::interpft");
 }
 
@@ -176,7 +178,8 @@ TEST_F(Interp, LinearRowsAndColumnsHoldTheLast) {
     ASSERT_EQ(interp_.interp_lin(samples.data(), 2, 1, 8, 1, grown.data()), 0);
     EXPECT_EQ(grown, (Samples{{0, 8}, {1, 6}, {2, 4}, {3, 2}, {4, 0}, {4, 0}, {4, 0}, {4, 0}}));
 
-    EXPECT_EQ(interp_.interp_lin(rows, 1, 3, 1, 2, down), 0) << "nothing grows";
+    for (const auto& [nx, ny] : {std::pair{1, 2}, {3, 1}, {2, 2}, {3, 3}})
+        EXPECT_EQ(interp_.interp_lin(rows, 3, 3, nx, ny, down), 0) << "nothing grows";
     EXPECT_EQ(down[1], 0.5F);
 }
 
@@ -311,6 +314,7 @@ TEST(Interp2, RefusesAndSurvivesShortMemory) {
     EXPECT_EQ(p.interp2(image.data(), 5, 3, at, at, 2, out.data(), 0), 1);
     EXPECT_EQ(p.interp2(image.data(), 5, 3, at, 2, at, 2, out.data(), 65), 1);
     EXPECT_EQ(p.interp2(image.data(), 5, 3, at, 0, at, 2, out.data()), 1);
+    EXPECT_EQ(p.interp2(image.data(), 5, 3, at, INT_MAX, at, INT_MAX, out.data()), 1);
     EXPECT_EQ(p.interp2(image.data(), 5, 3, at, at, 0, out.data()), 0);
     EXPECT_EQ(out, Samples(4, fcomplex{-999.0F}));
     set_flg_report(0);
@@ -339,6 +343,7 @@ TEST(DemodulationPhase, MakesASignalOfItsPhaseConstantAndBack) {
     EXPECT_EQ(law.applyModPhase(nullptr, nx, ny), 1);
     EXPECT_EQ(law.applyDemodPhase(data.data(), 0, ny), 1);
     EXPECT_EQ(law.applyDemodPhase(data.data(), nx, -1), 1);
+    EXPECT_EQ(law.applyDemodPhase(data.data(), INT_MAX, INT_MAX), 1);
     set_flg_report(0);
     test::fail_every_allocation([&] { return law.applyDemodPhase(data.data(), nx, ny); });
     set_flg_report(1);

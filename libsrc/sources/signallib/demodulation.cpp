@@ -3,6 +3,7 @@
 
 #include "diagnosticslib/call_frame.h"
 #include "quo_base/interp.h"
+#include "signallib/image_size.h"
 
 namespace {
 
@@ -11,7 +12,7 @@ constexpr const char* kSource = R"(..\..\..\binsrc\cutover\sources\interp)";
 /** Multiplies every row by exp(i sign phase). */
 int turn(const demodulationPhase& law, double sign, fcomplex* data, int nx, int ny, const char* function) {
     quo::CallFrame frame{function, kSource};
-    if (!data || nx < 1 || ny < 1) return frame.fail(QUO_REFUSED, "No image or a size below 1");
+    if (!data || !quo::addressable<fcomplex>(nx, ny)) return frame.fail(QUO_REFUSED, "No image or a size below 1");
     quo::TrackedBuffer<fcomplex> turns{static_cast<std::size_t>(nx)};
     if (!turns) return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
     for (int k = 0; k < nx; ++k) turns[static_cast<std::size_t>(k)] = std::polar(1.0, sign * law.getDemodPhase(k));

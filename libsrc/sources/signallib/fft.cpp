@@ -10,6 +10,7 @@
 #include "diagnosticslib/errno_kept.h"
 #include "quo_base/ckerr.h"
 #include "sarutillib/checked_size.h"
+#include "signallib/image_size.h"
 #include "signallib/plan_store.h"
 
 namespace {
@@ -40,8 +41,8 @@ struct Request {
     bool in_place;
 
     [[nodiscard]] int check() const {
-        const auto bytes = quo::Checked<std::ptrdiff_t>{n} * m * quo::floats_of(domain) * sizeof(float);
-        if (n < 1 || m < 1 || !bytes.value()) return kBadSize;
+        if (!(domain == FftDomain::Complex ? quo::addressable<fcomplex>(n, m) : quo::addressable<float>(n, m)))
+            return kBadSize;
         if (nfft < 1 || nfft > n) return kBadRowLength;
         if (mfft < 1 || mfft > m) return kBadColumnLength;
         if (!rows().valid()) return kNoRows;
@@ -71,10 +72,9 @@ void close(const FftEnginePlan* handle) {
 /** The only thing that plans report: a caller cannot mend it, the person who installs the library can. */
 int no_engine(int status, const char* function, int line = __builtin_LINE()) {
     quo_add_report(
-        "No FFT engine can be loaded: install libquo_base_fftw.so beside the library in quo_base/ or name it in "
-        "QUO_FFTW_MODULE, or install MKL (libmkl_rt.so) or name it in QUO_MKL_LIBRARY; QUO_FFT_ENGINE must be "
-        "auto, "
-        "mkl or fftw",
+        "No FFT engine can be loaded: install libquo_base_fftw.so beside the library in quo_base/, or name it in "
+        "QUO_FFTW_MODULE; or install MKL (libmkl_rt.so, in Debian the package libmkl-rt), or name it in "
+        "QUO_MKL_LIBRARY. QUO_FFT_ENGINE chooses: auto, mkl or fftw",
         QUO_ERROR, line, function, "fft");
     return status;
 }

@@ -5,12 +5,14 @@
 #include <numeric>
 
 #include "diagnosticslib/call_frame.h"
+#include "signallib/image_size.h"
 #include "signallib/plan_store.h"
 
 namespace {
 
 constexpr const char* kSource = R"(..\..\..\binsrc\cutover\sources\interp)";
 constexpr const char* kBothAxes = "Only one axis may change size";
+constexpr const char* kNoImage = "No image, a size below 1 or beyond any memory";
 
 /** Where the bins of N samples go among those of M. */
 struct Padding {
@@ -70,8 +72,9 @@ void interpolate_linearly(const Real* in, std::ptrdiff_t outer, std::ptrdiff_t a
 template <typename Real>
 int grow_linearly(quo::CallFrame& frame, const Real* in, int nx_in, int ny_in, int nx_out, int ny_out, Real* out,
                   int parts) {
-    if (!in || !out || nx_in < 1 || ny_in < 1 || nx_out < 1 || ny_out < 1)
-        return frame.fail(QUO_REFUSED, "No image or a size below 1");
+    if (!in || !out || !quo::addressable<dcomplex>(nx_in, ny_in) || !quo::addressable<dcomplex>(nx_out, ny_out))
+        return frame.fail(QUO_REFUSED, kNoImage);
+    if (nx_out <= nx_in && ny_out <= ny_in) return frame.success();
     if (nx_in != nx_out && ny_in != ny_out) return frame.fail(QUO_REFUSED, kBothAxes);
     const auto row = std::ptrdiff_t{nx_in} * parts;
     if (ny_out > ny_in) interpolate_linearly<Real>(in, 1, ny_in, row, ny_out / ny_in, out, 0);
@@ -88,7 +91,8 @@ int interp::setplans(int nx_in, int ny_in, int nx_out, int ny_out) {
     quo::CallFrame frame{"interp::setplans", kSource};
     destroyplans();
     if (nx_in != nx_out && ny_in != ny_out) return frame.fail(QUO_REFUSED, kBothAxes);
-    if (nx_in < 1 || ny_in < 1) return frame.fail(QUO_REFUSED, "A size below 1");
+    if (!quo::addressable<fcomplex>(nx_in, ny_in) || !quo::addressable<fcomplex>(nx_out, ny_out))
+        return frame.fail(QUO_REFUSED, kNoImage);
     if (nx_out < nx_in || ny_out < ny_in) return frame.fail(QUO_REFUSED, "Zero-padding makes no image smaller");
     nx_in_ = nx_in;
     ny_in_ = ny_in;

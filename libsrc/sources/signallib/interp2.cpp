@@ -6,6 +6,7 @@
 
 #include "diagnosticslib/call_frame.h"
 #include "quo_base/interp.h"
+#include "signallib/image_size.h"
 
 namespace {
 
@@ -98,7 +99,7 @@ void blend_rows(const fcomplex* in, int nx, const Taps& y, fcomplex* row) {
 
 bool valid(const fcomplex* in, int nx, int ny, const double* x, const double* y, const fcomplex* out,
            int lowpass) {
-    return in && x && y && out && nx >= 1 && ny >= 1 && lowpass >= 1 && lowpass <= kMostLowpass;
+    return in && x && y && out && quo::addressable<fcomplex>(nx, ny) && lowpass >= 1 && lowpass <= kMostLowpass;
 }
 
 }  // namespace
@@ -136,7 +137,7 @@ int interp2D::interp2(const fcomplex* in, int nx, int ny, const double* x, const
 int interp2D::interp2(const fcomplex* in, int nx, int ny, const double* x, int nx_out, const double* y, int ny_out,
                       fcomplex* out, int lowpass) {
     quo::CallFrame frame{"interp2D::interp2", kSource};
-    if (!valid(in, nx, ny, x, y, out, lowpass) || nx_out < 1 || ny_out < 1)
+    if (!valid(in, nx, ny, x, y, out, lowpass) || !quo::addressable<fcomplex>(nx_out, ny_out))
         return frame.fail(QUO_REFUSED, "No image, no positions or a wrong size");
     if (!tabulate(lowpass)) return frame.fail(QUO_NO_MEMORY, kNoMemory);
     const Weights weights{table_.data(), lowpass};
