@@ -45,8 +45,9 @@ public:
     SAROrbitStateVectors_Obj();
     ~SAROrbitStateVectors_Obj() override;
 
-    /** Allocates the arrays for nSV_n state vectors, zero-filled. 0; 1 for a negative count, one that 32 bits
-     * cannot hold three times, or one that the file being read is too short for; 7. Only 0 leaves arrays behind.
+    /** Allocates the arrays for nSV_n state vectors, zero-filled; 0 vectors need none. 0; 1 for a negative count,
+     * one that 32 bits cannot hold three times, or one that the file being read is too short for; 7. Only 0 leaves
+     * arrays behind.
      */
     int createBuffers() override;
     int destroyBuffers() override;
@@ -61,6 +62,7 @@ public:
     /** Drops what was there and makes room for `nStateVectors` (>= 0) vectors; the caller fills pSV_m and vSV_mOs.
      * 0, or the status of createBuffers(). */
     int SVCreate(double timeFirst, double timeDelta, int nStateVectors) noexcept;
+    /** Releases vectors and polynomials; their number is then 0. Returns 0. */
     int SVDestroy() noexcept;
     /** Fits the polynomials of degree nSV_n - 1: positions, and velocities of their own. 0; 1 without vectors; or
      * the status of orb_interp(). A degree above about 15 follows its samples poorly between them. */
@@ -137,8 +139,8 @@ public:
     int writehdr(const char* file) override;
     /** Reads the section from the header file, or else from the same file as a parameter file (keys TimeFirst,
      * TimeDelta, nStateVectors, pos, vel), and builds the model.
-     * @return 0; 4 when neither form is there or complete; 7; or the status of computeApproximateSV(). A failure
-     * leaves the orbit empty. */
+     * @return 0; 4 when neither form is there or complete; 1 for a parameter file that tells of fewer than five
+     * vectors; 7; or the status of computeApproximateSV(). A failure leaves the orbit empty. */
     int readhdr(const char* file) override;
     /** Copies vectors, model, wavelength and look sign into `other`. 0; 1 for null; 7, and `other` is then empty.
      */
@@ -149,12 +151,13 @@ public:
     /** Radar wavelength, m, > 0; 1 for anything else. */
     int setLambda(double lambda) noexcept;
     double getLambda() const noexcept;
-    /** Negative looks left, zero or positive right. */
+    /** Negative looks left, zero or positive right. Returns 0. */
     int setLookSign(int sign) noexcept;
     int getLookSign() const noexcept;
     /** Drops what was there and makes room for at least five vectors. The caller fills pSV_m and vSV_mOs and calls
      * computeApproximateSV(). 0; 1 ("You must provide at least 5 state vectors!"); or createBuffers()'s status. */
     int SVCreate(double timeFirst, double timeDelta, int nStateVectors) noexcept;
+    /** Releases vectors and model; their number is then 0. Returns 0. */
     int SVDestroy() noexcept;
     /** Builds the model from the state vectors; to be called again whenever they, t0SV_s or dtSV_s changed.
      * @return 0; 1 without at least five vectors, or for times that are not finite or a spacing not above 0; or
@@ -181,13 +184,14 @@ public:
 
     // --- the orbit at a time ---------------------------------------------------------------------
 
+    /** Position (three values, m) and velocity (m/s, the derivative of the position polynomial) at time t. */
     int SVGetPos(double t, double* xyz) noexcept;
     int SVGetVel(double t, double* vxyz) noexcept;
     /** The same into a result that belongs to the orbit, one for positions and one for velocities, and holds until
      * the next such call; three not-a-numbers after a failure. */
     double* SVGetPos(double t) noexcept;
     double* SVGetVel(double t) noexcept;
-    /** Takes the run of five that suits time t. */
+    /** Takes the run of five that suits time t, where the present one does not. */
     int updatePolys(double t) noexcept;
     /** How often another run was taken since the model was built. */
     std::int64_t polyUpdates() const noexcept;

@@ -53,17 +53,20 @@ public:
     quorelxml(const quorelxml&) = delete;
     quorelxml& operator=(const quorelxml&) = delete;
 
-    /** Whether failures print messages (standard error) and enter the report (kind WARNING); off at first. */
+    /** Whether failures print messages (standard error) and enter the report (kind WARNING); off at first. Returns
+     * 0. */
     int setDebug(bool debug) noexcept;
-    /** As the constructor with a file name; what was loaded before is dropped. */
+    /** As the constructor with a file name; what was loaded before is dropped.
+     * @return 0; 1 for a name that does not fit, with a fresh document that has no file; 7, with none */
     int initXmlFile(const char* file_name) noexcept;
     /** Loads the file (or makes a fresh document), sets `Description`, saves and empties the object again.
-     * @return 0; 1 when the file cannot be saved, which leaves the old one whole. */
+     * @return 0; 1 for a name that does not fit, a text that XML cannot hold or a file that cannot be saved; 7. A
+     * failure leaves the old file whole. */
     int setDescription(const char* file_name, const char* text) noexcept;
     /** Saves the document under its file name, freshly indented, UTF-8. The new file replaces the old one in one
      * step: when saving fails (1) the old file is still whole. */
     int write() noexcept;
-    /** Drops the document; safe to call repeatedly. */
+    /** Drops the document; safe to call repeatedly. Returns 0. */
     int clean() noexcept;
 
     /** Reads `count` values of a field into the caller's array.
@@ -82,7 +85,9 @@ public:
     int readString(int channel, const char* field, char* const* values, int count, std::size_t room) noexcept;
 
     /** Writes `count` values of a field into the document in memory, creating channel and elements as needed;
-     * write() saves them. A count below 1 writes nothing. */
+     * write() saves them. Of elements beyond `count` none is removed. A count below 1 writes nothing.
+     * @return 0; 1 for a field path or a text that XML cannot hold, with the document unchanged; 7, where some of
+     * the values may have been written. */
     int writeInt(int channel, const char* field, const std::int32_t* values, int count) noexcept;
     int writeFloat(int channel, const char* field, const float* values, int count) noexcept;
     int writeDouble(int channel, const char* field, const double* values, int count) noexcept;
@@ -206,11 +211,13 @@ public:
     int setParamListAlloc(bool owned) noexcept;
     bool isBufferAllocated() const noexcept;
 
-    /** Attaches a header file: loads it (or makes a fresh document) for the operations without arguments. */
+    /** Attaches a header file: loads it (or makes a fresh document) for the operations without arguments. What was
+     * attached before is detached.
+     * @return 0; 1 for a file or section name that is empty (the section's) or has 512 bytes or more; 7 */
     int setAuxiliaryFile(const char* file, int channel, const char* section) noexcept;
-    /** Detaches it again. Unsaved changes are dropped. */
+    /** Detaches it again. Unsaved changes are dropped. Returns 0. */
     int unsetAuxiliaryFile() noexcept;
-    /** Removes the object's section from the attached document. */
+    /** Removes the object's section from the attached document; 0, also where there is none. */
     int cleanAuxiliaryFile() noexcept;
     /** Replaces the object's section in the attached document and saves it.
      * @return 0; 1 when the buffers are not allocated, a text cannot be stored or the file cannot be saved (with a

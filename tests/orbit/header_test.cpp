@@ -152,42 +152,52 @@ TEST_F(Header, MissingPartsGiveFourAndAnEmptyOrbit) {
 }
 
 struct HostileCount {
-    const char* name;
     std::int64_t count;
-    int orbit_status, record_status;
+    int in_header, in_parameters;  // status of the orbit
+    int of_record;                 // and of the plain record, in either
 };
 // A count of which the file cannot hold the values costs no memory; fewer than five are no orbit.
 constexpr HostileCount kHostileCounts[] = {
-    {"MinusOne", -1, QUO_READ_FAILED, QUO_READ_FAILED},
-    {"Lowest", std::numeric_limits<std::int32_t>::min(), QUO_READ_FAILED, QUO_READ_FAILED},
-    {"Highest", std::numeric_limits<std::int32_t>::max(), QUO_READ_FAILED, QUO_READ_FAILED},
-    {"MostThatAreCounted", std::numeric_limits<std::int32_t>::max() / 3, QUO_READ_FAILED, QUO_READ_FAILED},
-    {"MoreThanTheFileHolds", 100000, QUO_READ_FAILED, QUO_READ_FAILED},
-    {"Unknown", -999, QUO_READ_FAILED, QUO_READ_FAILED},
-    {"None", 0, QUO_REFUSED, 0},
-    {"Four", 4, QUO_REFUSED, 0},
+    {-1, QUO_READ_FAILED, QUO_REFUSED, QUO_READ_FAILED},
+    {std::numeric_limits<std::int32_t>::min(), QUO_READ_FAILED, QUO_REFUSED, QUO_READ_FAILED},
+    {std::numeric_limits<std::int32_t>::max(), QUO_READ_FAILED, QUO_READ_FAILED, QUO_READ_FAILED},
+    {std::numeric_limits<std::int32_t>::max() / 3, QUO_READ_FAILED, QUO_READ_FAILED, QUO_READ_FAILED},
+    {100000, QUO_READ_FAILED, QUO_READ_FAILED, QUO_READ_FAILED},
+    {-999, QUO_READ_FAILED, QUO_REFUSED, QUO_READ_FAILED},
+    {0, QUO_REFUSED, QUO_REFUSED, 0},
+    {4, QUO_REFUSED, QUO_REFUSED, 0},
 };
-class Counts : public Header, public testing::WithParamInterface<HostileCount> {};
-INSTANTIATE_TEST_SUITE_P(Table, Counts, testing::ValuesIn(kHostileCounts),
-                         [](const auto& row) { return row.param.name; });
 
-TEST_P(Counts, AreJudgedBeforeTheyCount) {
-    const std::string count = std::to_string(GetParam().count);
-    const std::string header =
-        file_of(header_file(orbit_, folder_.file("out.xml"), "nSV_n", "<nSV_n>" + count + "</nSV_n>"));
-    const std::string parameters =
-        file_of(parameter_file(orbit_, "nStateVectors", "nStateVectors = " + count + "\n"));
-    for (const std::string& file : {header, parameters}) {
-        SCOPED_TRACE(file == header ? "header" : "parameter file");
+TEST_F(Header, CountsAreJudgedBeforeTheyCount) {
+    const test::Report report;
+    for (const HostileCount& row : kHostileCounts) {
+        SCOPED_TRACE(row.count);
+        const std::string count = std::to_string(row.count);
         fill(orbit_);
-        EXPECT_EQ(orbit_.readhdr(file.c_str()), GetParam().orbit_status);
-        expect_empty(orbit_);
-        double xyz[3] = {1.0, 2.0, 3.0};
-        EXPECT_EQ(orbit_.SVGetPos(803460.0, xyz), QUO_REFUSED);
-        SAROrbitStateVectors_Obj record;
-        EXPECT_EQ(record.readhdr(file.c_str()), GetParam().record_status);
-        EXPECT_EQ(record.nSV_n, GetParam().record_status ? 0 : GetParam().count);
+        const std::string header =
+            file_of(header_file(orbit_, folder_.file("out.xml"), "nSV_n", "<nSV_n>" + count + "</nSV_n>"));
+        const std::string parameters =
+            file_of(parameter_file(orbit_, "nStateVectors", "nStateVectors = " + count + "\n"));
+        for (const std::string& file : {header, parameters}) {
+            SCOPED_TRACE(file == header ? "header" : "parameter file");
+            fill(orbit_);
+            const int status = file == header ? row.in_header : row.in_parameters;
+            EXPECT_EQ(orbit_.readhdr(file.c_str()), status);
+            EXPECT_EQ(report.messages("ERROR").back() == "You must provide at least 5 state vectors!",
+                      status == QUO_REFUSED);
+            expect_empty(orbit_);
+            double xyz[3] = {1.0, 2.0, 3.0};
+            EXPECT_EQ(orbit_.SVGetPos(803460.0, xyz), QUO_REFUSED);
+            SAROrbitStateVectors_Obj record;
+            EXPECT_EQ(record.readhdr(file.c_str()), row.of_record);
+            EXPECT_EQ(record.nSV_n, row.of_record ? 0 : row.count);
+        }
     }
+    // Too few vectors are told from missing ones even where their values are missing as well.
+    fill(orbit_);
+    std::string few = parameter_file(orbit_, "pos");
+    few.replace(few.find("Vectors = 6") + 10, 1, "3");
+    EXPECT_EQ(read(orbit_, few), QUO_REFUSED);
 }
 
 TEST_F(Header, NotANumberInAPositionIsNoOrbit) {

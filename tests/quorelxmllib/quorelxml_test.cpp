@@ -83,6 +83,9 @@ TEST_F(Quorelxml, RefusesFileNamesThatDoNotFit) {
     EXPECT_EQ(document.write(), 1);
     EXPECT_EQ(document.initXmlFile(nullptr), 0);
     EXPECT_EQ(document.write(), 1);
+    // A document without a file once stayed behind.
+    EXPECT_EQ(document.setDescription(longest.c_str(), "New"), 1);
+    EXPECT_FALSE(document.loaded());
 }
 
 // --- what the documentation shows -------------------------------------------------------------------------------
@@ -161,6 +164,15 @@ TEST_F(Quorelxml, KeepsWhatItDoesNotKnow) {
     std::string expected = text;
     expected.replace(expected.find("1.5"), 3, "2.5");
     EXPECT_EQ(read_text(folder_.file("header.xml")), expected);
+}
+
+TEST_F(Quorelxml, TurnsOtherEncodingsIntoUtf8) {
+    const auto text = [](const char* encoding, const char* letter) {
+        std::string whole = header_text(std::string{"    <a b=\""} + letter + "\">Universit" + letter + "</a>\n");
+        return whole.replace(whole.find("UTF-8"), 5, encoding);
+    };
+    EXPECT_EQ(quorelxml{file(text("ISO-8859-1", "\xE0")).c_str()}.write(), 0);
+    EXPECT_EQ(read_text(folder_.file("header.xml")), text("UTF-8", "\xC3\xA0"));
 }
 
 TEST_F(Quorelxml, SetsTheDescriptionOnDisk) {

@@ -11,6 +11,7 @@
 #include "generalSAR/orbit_check.h"
 #include "generalSAR/orbit_model.h"
 #include "generalSAR/orbit_table.h"
+#include "quo_base/profile.h"
 
 namespace {
 
@@ -25,6 +26,16 @@ constexpr const auto& kTable = quo::kStateVectorTable<Obj>;
 
 quo::StateVectors states_of(const Obj& orbit) noexcept {
     return {orbit.pSV_m, orbit.vSV_mOs, orbit.nSV_n, orbit.dtSV_s};
+}
+
+/** Whether a parameter file tells the times and the number of vectors, but the number is too small. */
+bool lists_too_few(const char* file) noexcept {
+    double times[2] = {};
+    std::int32_t count = 0;
+    return file && GetProfileDoubleArray(kTable.section(), "TimeFirst", &times[0], 1, file) == QUO_OK &&
+           GetProfileDoubleArray(kTable.section(), "TimeDelta", &times[1], 1, file) == QUO_OK &&
+           GetMyProfileIntArray(kTable.section(), "nStateVectors", &count, 1, file) == QUO_OK &&
+           count < quo::OrbitModel::kRunVectors;
 }
 
 /** Intervals of re-sampled vectors; 0 for more than can be counted. */
@@ -76,6 +87,7 @@ int Obj::readhdr(const char* file) {
     if (!status) status = computeApproximateSV();
     if (!status) return frame.success();
     SVDestroy();
+    if (status == QUO_READ_FAILED && lists_too_few(file)) return frame.fail(QUO_REFUSED, kTooFew);
     return frame.callee(status);
 }
 

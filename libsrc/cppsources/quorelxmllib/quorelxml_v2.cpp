@@ -193,7 +193,10 @@ int quorelxml::write() noexcept {
 
 int quorelxml::setDescription(const char* file_name, const char* text) noexcept {
     CallFrame frame{"quorelxml::setDescription", kSource};
-    if (const int status = initXmlFile(file_name)) return frame.callee(status);
+    if (const int status = initXmlFile(file_name)) {
+        document_.reset();
+        return frame.callee(status);
+    }
     const int status = guarded(frame, [&] {
         const auto content = quo::xml_text(quo::text_or_empty(text));
         if (!content) return frame.fail(QUO_REFUSED, "Text cannot be stored in XML");
