@@ -14,30 +14,25 @@ namespace {
 
 TEST(QuorelException, KeepsMessageAndPosition) {
     errno = ENOENT;
-    const quorelException generic;
-    EXPECT_STREQ(generic.what(), "generic quorel exception.\n");
-    EXPECT_EQ(generic.getLine(), 0);
-    EXPECT_STREQ(generic.getFunction(), "");
-    EXPECT_STREQ(generic.getFile(), "");
-    EXPECT_EQ(generic.getErrorNumber(), ENOENT);
-
-    const quorelException placed{17, "focus", "chain.cpp"};
-    EXPECT_STREQ(placed.what(), "chain.cpp: focus (17): exception found");
-    EXPECT_EQ(placed.getErrorNumber(), ENOENT);
-
-    const quorelException whole{17, "focus", "chain.cpp", "no 100%s luck"};
-    EXPECT_STREQ(whole.what(), "no 100%s luck");
-    EXPECT_EQ(whole.getLine(), 17);
-    EXPECT_STREQ(whole.getFunction(), "focus");
-    EXPECT_STREQ(whole.getFile(), "chain.cpp");
-    EXPECT_EQ(whole.getErrorNumber(), 0);
-
-    const quorelException bare{"alone"};
-    EXPECT_STREQ(bare.what(), "alone");
-    EXPECT_EQ(bare.getLine(), -1);
-    EXPECT_STREQ(bare.getFunction(), "UNKNOWN FUNCTION");
-    EXPECT_STREQ(bare.getFile(), "UNKNOWN FILE");
-    EXPECT_EQ(bare.getErrorNumber(), 0);
+    const struct {
+        quorelException made;
+        const char* message;
+        int line;
+        const char *function, *file;
+        int error;
+    } rows[] = {
+        {{}, "generic quorel exception.\n", 0, "", "", ENOENT},
+        {{17, "focus", "chain.cpp"}, "chain.cpp: focus (17): exception found", 17, "focus", "chain.cpp", ENOENT},
+        {{18, "scan", "io.cpp", "no 100%s luck"}, "no 100%s luck", 18, "scan", "io.cpp", 0},
+        {quorelException{"alone"}, "alone", -1, "UNKNOWN FUNCTION", "UNKNOWN FILE", 0},
+    };
+    for (const auto& [made, message, line, function, file, error] : rows) {
+        EXPECT_STREQ(made.what(), message);
+        EXPECT_EQ(made.getLine(), line) << message;
+        EXPECT_STREQ(made.getFunction(), function) << message;
+        EXPECT_STREQ(made.getFile(), file) << message;
+        EXPECT_EQ(made.getErrorNumber(), error) << message;
+    }
     errno = 0;
 }
 
@@ -63,24 +58,17 @@ TEST(QuorelReport, WritesEntriesOfEveryForm) {
     report.end_report();
 
     const auto entries = open.entries();
-    ASSERT_EQ(entries.size(), 5U);
-    EXPECT_EQ(entries[0].kind, "WARNING");
-    EXPECT_EQ(entries[0].message, "3 of seven");
-    EXPECT_EQ(entries[0].file, "chain.cpp");
-    EXPECT_EQ(entries[0].function, "focus");
-    EXPECT_EQ(entries[0].line, 17);
-    EXPECT_EQ(entries[1].kind, "UNKNOWN");
-    EXPECT_EQ(entries[1].message, "no kind 5");
-    EXPECT_EQ(entries[1].file, "UNKNOWN");
-    EXPECT_EQ(entries[1].function, "UNKNOWN");
-    EXPECT_EQ(entries[1].line, 0);
-    EXPECT_EQ(entries[2].kind, "CHECKPOINT");
-    EXPECT_EQ(entries[2].message, "half way");
-    EXPECT_EQ(entries[3].kind, "ERROR");
-    EXPECT_EQ(entries[3].message, "100%s %n done");
-    EXPECT_EQ(entries[3].line, 9);
-    EXPECT_EQ(entries[4].kind, "CHECKPOINT");
-    EXPECT_EQ(entries[4].message, "End of processing");
+    const test::ReportEntry expected[] = {{0, "WARNING", "3 of seven", "chain.cpp", "focus", 17},
+                                          {1, "UNKNOWN", "no kind 5", "UNKNOWN", "UNKNOWN", 0},
+                                          {2, "CHECKPOINT", "half way", "UNKNOWN", "UNKNOWN", 0},
+                                          {3, "ERROR", "100%s %n done", "io.cpp", "scan", 9},
+                                          {4, "CHECKPOINT", "End of processing", "UNKNOWN", "UNKNOWN", 0}};
+    ASSERT_EQ(entries.size(), std::size(expected));
+    for (std::size_t i = 0; i < entries.size(); ++i) {
+        EXPECT_EQ(entries[i].kind + ": " + entries[i].message, expected[i].kind + ": " + expected[i].message);
+        EXPECT_EQ(entries[i].file + ", " + entries[i].function, expected[i].file + ", " + expected[i].function);
+        EXPECT_EQ(entries[i].line, expected[i].line);
+    }
 }
 
 TEST(QuorelReport, CutsLongMessagesAndStaysSilentWhileClosed) {
