@@ -97,9 +97,10 @@ public:
      * before its end; whence 1 likewise, else the target is measured from the start of the buffer, deliberately.
      * 0; 1 for another whence, a closed file or a place before the start; 5. */
     int seek(int64_t offset, int whence);
-    /** Reads n bytes. 0; 1 in modes 1 and 2 or for a negative n; 4. */
+    /** Reads n bytes. 0; 1 in modes 1 and 2 or for a negative n; 4 where fewer are left, unbuffered with the
+     * position as it was; 5 in mode 3, where pending bytes could not be written first. */
     int read(char* dst, int64_t n);
-    /** Writes n bytes. 0; 1 in mode 0 or for a negative n; 5. */
+    /** Writes n bytes. 0; 1 in mode 0 or for a negative n; 5, with what was pending before still pending. */
     int write(const char* src, int64_t n);
     /** The position; buffered, the file offset of the buffer's start plus the cursor in it. */
     [[nodiscard]] int64_t tell() const;
@@ -136,6 +137,7 @@ private:
     int flushBuffer();
     int readBuffered(char* dst, int64_t n);
     int writeBuffered(const char* src, int64_t n);
+    int writeDirectly(const char* src, int64_t n);
     int seekWriting(int64_t offset);
     int seekReading(int64_t offset, int whence);
     int prepareRegion(int64_t next);
@@ -144,6 +146,7 @@ private:
     std::unique_ptr<char[]> buffer_;
     int64_t position_ = 0;
     int32_t cursor_ = 0, fill_ = 0, state_ = 0;
+    bool pending_ = false;  // the buffer holds bytes before its cursor that the file does not have yet
 };
 
 /** Reads or writes a rectangle of lines and samples through a DataFile, converting between its cell type and the
@@ -161,16 +164,21 @@ public:
     /** A region of `file`, which the caller keeps. `memory_type` is the cell type of the caller's buffers. */
     BufferIO(DataFile* file, int first_sample, int samples, int first_line, int lines, int memory_type);
 
-    /** Reads the line prefixes of the region, RowPrefix bytes a line, into dst. Opens a closed file for reading.
-     */
+    /** Reads the line prefixes of the region's lines, RowPrefix bytes a line, packed, into dst. Opens a closed
+     * file for reading and leaves it open, at the line after the region. 0; 1 for a file that is open for writing
+     * only or a description that makes no lines; 4, 5, 7, 9. */
     int readprefix(char* dst);
     /** Reads the region into dst, whose rows are `width` samples of the memory type apart. Opens a closed file for
-     * reading. 0; 1 for 8-bit types, a region outside the lines or a width smaller than the region; 4, 7, 9. */
+     * reading and leaves it open, at the line after the region. 0; 1 for 8-bit types, a region outside the lines,
+     * a width smaller than the region or a file that is open for writing only; 4, 5, 7, 9. */
     int readbuffer(char* dst, int width);
-    /** Writes the line prefixes of the region. The file must be open for writing (else 1). */
+    /** Writes the line prefixes of the region's lines, packed in src. 0; 1 for a file that is not open for writing
+     * or a description that makes no lines; 5, 7. */
     int writeprefix(const char* src);
-    /** Writes the region from src, whose rows are `width` samples apart. The file must be open for writing (else
-     * 1). */
+    /** Writes the region from src, whose rows are `width` samples of the memory type apart: as many as the region
+     * has samples unless told. 0; 1 for a file that is not open for writing, a pair of types that is not written,
+     * a region outside the lines or a width smaller than it; 5, 7. */
+    int writebuffer(const char* src);
     int writebuffer(const char* src, int width);
 
     DataFile* File;                ///< the raster
@@ -233,8 +241,9 @@ public:
     /** Opens the raster; READ_WRITE needs it to exist. Any other mode, or a file that cannot be opened, leaves it
      * closed. A file that is open is closed first. */
     void open(int mode);
-    /** Gives the open file a buffer of `size` bytes; reading, `keep` bytes (at most size - 1) of what was passed
-     * stay when it slides. Ignored for size < 1. */
+    /** Gives the open file a buffer of `size` bytes and goes to its start; reading, `keep` bytes (at most size -
+     * 1) of what was passed stay when it slides. Ignored for a closed file and for size < 1; without memory the
+     * file is unbuffered. */
     void initbuffer(int size, int keep);
     /** Writes what is pending and closes the file; the buffer is released. */
     void close();
@@ -246,17 +255,20 @@ public:
     [[nodiscard]] int64_t tell() const;
     /** Bytes read: fewer than n at the end of the file, 0 in mode WRITE. */
     int read(void* dst, int n);
-    /** Bytes written: fewer than n when the disk is full, 0 in mode READ. */
+    /** Bytes written: fewer than n when the disk is full, 0 in mode READ. What a full disk did not take of a
+     * buffer stays pending and is tried again with the next write, block or close(); a seek() out of the buffer
+     * gives it up. */
     int write(const void* src, int n);
 
     /** @name Blocks
      * `lines` lines of `samples` samples (0: all of a line) from or to a packed array. Real types convert between
      * FLOAT32, FLOAT64, INT32 and INT16 files, complex ones between FLOAT_COMPLEX, DOUBLE_COMPLEX, INT_COMPLEX and
      * SHORT_COMPLEX; values going to an integer type are rounded half away from zero and held at its bounds, no
-     * number becomes 0. Any other combination, a closed file, or a block that does not lie within the lines or,
-     * reading, the file, leaves everything untouched. Deliberate: from `fcomplex`, DOUBLE_COMPLEX files are not
-     * written and FLOAT64 files get two doubles a sample (so that a line takes NrOfPixelsPerLine / 2 of them,
-     * which 0 stands for); from `double`, only FLOAT64, INT32 and INT16 files are written.
+     * number becomes 0. Any other combination, a closed file, a file in mode WRITE (reading) or READ (writing), or
+     * a block that does not lie within the lines or, reading, the file, leaves everything untouched. Afterwards
+     * the place is the line after the block. Deliberate: from `double`, only FLOAT64, INT32 and INT16 files are
+     * written; from `fcomplex`, DOUBLE_COMPLEX files are not written, and FLOAT64 files get two doubles for each
+     * of the `samples`, where lines without room for them grow: the next one follows at once.
      * @{ */
     void readbuffer(float* dst, int first_line, int lines, int first_sample, int samples);
     void readbuffer(double* dst, int first_line, int lines, int first_sample, int samples);
@@ -271,13 +283,15 @@ public:
     void writebuffer(const fcomplex* src, int first_line, int lines, int first_sample, int samples);
     void writebuffer(const dcomplex* src, int first_line, int lines, int first_sample, int samples);
     /** @} */
-    void readprefix(char* dst, int first_line, int lines);         ///< RowPrefix bytes a line, packed
-    void writeprefix(const char* src, int first_line, int lines);  ///< RowPrefix bytes a line, packed
+    /** The prefixes of some lines, RowPrefix bytes a line, packed; ignored as blocks are. */
+    void readprefix(char* dst, int first_line, int lines);
+    void writeprefix(const char* src, int first_line, int lines);
     /** Writes the first n bytes of the file header, at most HeaderOffset, and returns to the place before. */
     void writeOffset(const char* src, int n);
 
     /** @name Single samples, as they stand in the file
-     * 0 unless the file is open, holds just this type, is little-endian and has the sample.
+     * 0 unless the file is open in mode READ or READ_WRITE, holds just this type, is little-endian and has the
+     * sample. The place moves behind it.
      * @{ */
     float readFloat(int line, int sample);
     double readDouble(int line, int sample);

@@ -6,7 +6,6 @@
 #include <cstdint>
 #include <cstring>
 #include <limits>
-#include <optional>
 #include <string>
 #include <vector>
 
@@ -16,225 +15,143 @@
 
 namespace {
 
-constexpr int kLines = 3, kSamples = 701;  // more than one tile of the loops, and odd
+constexpr int kLines = 3, kSamples = 131, kPrefix = 3;  // odd, and more than a few vectors
 
 bool complex_type(int type) { return type % 2 == 0; }
-int part_size(int type) {
-    constexpr int kSizes[] = {4, 4, 8, 8, 4, 4, 2, 2, 1, 1};
-    return kSizes[type];
-}
-int size_of(int type) { return part_size(type) * (complex_type(type) ? 2 : 1); }
 
-double part_at(const std::string& bytes, int type, std::size_t index) {
-    const char* at = bytes.data() + index * static_cast<std::size_t>(part_size(type));
-    const auto get = [at](auto value) {
-        std::memcpy(&value, at, sizeof value);
-        return static_cast<double>(value);
-    };
-    switch (type) {
-        case FLOAT_COMPLEX:
-        case FLOAT32:
-            return get(float{});
-        case DOUBLE_COMPLEX:
-        case FLOAT64:
-            return get(double{});
-        case INT_COMPLEX:
-        case INT32:
-            return get(std::int32_t{});
-        default:
-            return get(std::int16_t{});
+/** The test raster with samples of a type; of real values where `pairs` is false. */
+std::string bytes_of(int type, int order, int prefix, bool pairs) {
+    std::string text;
+    for (int line = 0; line < kLines; ++line) {
+        text.append(static_cast<std::size_t>(prefix), '.');
+        for (int sample = 0; sample < kSamples; ++sample) {
+            for (int part = 0; part <= (complex_type(type) ? 1 : 0); ++part) {
+                const double value = part == 1 && !pairs ? 0.0 : test::part_value(line, sample, part);
+                test::append_part(text, type, value, order == 1);
+            }
+        }
     }
+    return text;
 }
 
-/** File types that BufferIO converts to a memory type, besides the type itself. */
-std::vector<int> sources_of(int memory) {
-    switch (memory) {
-        case FLOAT_COMPLEX:
-            return {SHORT_COMPLEX, INT_COMPLEX, DOUBLE_COMPLEX, FLOAT32, FLOAT64, INT16, INT32};
-        case FLOAT32:
-            return {INT16, INT32, FLOAT64};
-        case INT16:
-            return {INT32};
-        case INT32:
-            return {INT16};
-        case SHORT_COMPLEX:
-            return {INT_COMPLEX};
-        case INT_COMPLEX:
-            return {SHORT_COMPLEX};
-        case DOUBLE_COMPLEX:
-            return {FLOAT_COMPLEX, SHORT_COMPLEX, INT_COMPLEX, FLOAT64};
-        case FLOAT64:
-            return {FLOAT32, INT16, INT32};
-        default:
-            return {};
-    }
-}
-bool region_reads(int file, int memory) {
-    if (file > INT16 || memory > INT16) return false;
-    const std::vector<int> sources = sources_of(memory);
-    return file == memory || std::ranges::find(sources, file) != sources.end();
-}
+/** The cell types that an access converts from or to a memory type; 8-bit types never. */
+struct Access {
+    int memory;
+    const char *region_reads, *region_writes, *block_reads, *block_writes;
+};
+constexpr Access kAccesses[] = {
+    {FLOAT_COMPLEX, "01234567", "0246", "0246", "046"},  // blocks into FLOAT64: a test of its own
+    {FLOAT32, "1357", "01357", "1357", "1357"},
+    {DOUBLE_COMPLEX, "02346", "0246", "0246", "0246"},
+    {FLOAT64, "1357", "012357", "1357", "357"},
+    {INT_COMPLEX, "46", "0246", "", ""},
+    {INT32, "57", "13457", "1357", "1357"},
+    {SHORT_COMPLEX, "46", "0246", "", ""},
+    {INT16, "57", "13567", "1357", "1357"},
+    {INT8_COMPLEX, "", "", "", ""},
+    {INT8, "", "", "", ""},
+};
+bool lists(const char* types, int type) { return std::strchr(types, '0' + type) != nullptr; }
 
+/** A raster file of one cell type and byte order. */
 class EveryPair : public testing::TestWithParam<int> {
 protected:
-    void describe(RasterDescription& raster, int type) const {
+    void start(RasterDescription& raster, int type, const std::string& content) {
         raster.NrOfLinesPerImage = kLines;
         raster.NrOfPixelsPerLine = kSamples;
         raster.CellType = type;
         raster.ByteOrder = GetParam();
-        raster.RowPrefix = 3;
+        raster.RowPrefix = kPrefix;
+        test::write_text(name_, content);
+    }
+    /** What is expected of a reader or writer that converts, or does not. */
+    static void expect(const std::string& found, bool converts, const std::string& wanted,
+                       const std::string& untouched) {
+        EXPECT_TRUE(found == (converts ? wanted : untouched));
     }
     test::Report report_;
+    std::string name_ = report_.file("raster");
 };
 
-TEST_P(EveryPair, IsReadByRegionsAsTold) {
-    for (int type = 0; type <= 9; ++type) {
-        DataFile file;
-        describe(file, type);
-        file.setFilename(report_.file("type" + std::to_string(type)).c_str());
-        test::write_text(file.FileName, test::raster_bytes(file));
-        for (int memory = 0; memory <= 9; ++memory) {
-            SCOPED_TRACE(std::to_string(type) + " to " + std::to_string(memory));
-            const auto size = static_cast<std::size_t>(kLines * kSamples * size_of(memory));
-            std::string bytes(size, '\x55');
-            const test::CapturedStderr silent;
-            const int status = BufferIO{&file, 0, kSamples, 0, kLines, memory}.readbuffer(bytes.data(), kSamples);
-            EXPECT_EQ(status, type > INT16 || memory > INT16 ? 1 : 0);
-            if (!region_reads(type, memory)) {
-                EXPECT_EQ(bytes, std::string(size, '\x55')) << "left untouched";
-                continue;
-            }
-            const int parts = complex_type(memory) ? 2 : 1;
-            for (int i = 0; i < kLines * kSamples * parts; ++i) {
-                const int pixel = i / parts, part = i % parts;
-                const double expected = part == 1 && !complex_type(type)
-                                            ? 0.0
-                                            : test::part_value(pixel / kSamples, pixel % kSamples, part);
-                ASSERT_EQ(part_at(bytes, memory, static_cast<std::size_t>(i)), expected) << i;
-            }
+TEST_P(EveryPair, IsMovedByRegionsAsTold) {
+    const test::CapturedStderr silent;
+    for (const Access& access : kAccesses) {
+        for (int type = 0; type <= INT8; ++type) {
+            SCOPED_TRACE(testing::Message() << "file " << type << ", memory " << access.memory);
+            const bool refused = type > INT16 || access.memory > INT16, pairs = complex_type(access.memory);
+            const std::string packed = bytes_of(access.memory, 0, 0, complex_type(type));
+            std::string memory(packed.size(), 'U');
+            DataFile file;
+            file.setFilename(name_.c_str());
+            start(file, type, bytes_of(type, GetParam(), kPrefix, true));
+            BufferIO region{&file, 0, kSamples, 0, kLines, access.memory};
+            EXPECT_EQ(region.readbuffer(memory.data(), kSamples), refused ? 1 : 0);
+            expect(memory, lists(access.region_reads, type), packed, std::string(packed.size(), 'U'));
+            file.close();
+
+            const std::string written = bytes_of(type, GetParam(), kPrefix, pairs), blank(written.size(), '.');
+            start(file, type, blank);
+            ASSERT_EQ(file.open(2), 0);
+            const bool writes = lists(access.region_writes, type);
+            EXPECT_EQ(region.writebuffer(bytes_of(access.memory, 0, 0, true).data()), writes ? 0 : 1);
+            file.close();
+            expect(test::read_text(name_), writes, written, blank);
         }
     }
 }
 
-template <typename T>
-constexpr int kMemoryType = -1;
-template <>
-constexpr int kMemoryType<float> = FLOAT32;
-template <>
-constexpr int kMemoryType<double> = FLOAT64;
-template <>
-constexpr int kMemoryType<int> = INT32;
-template <>
-constexpr int kMemoryType<short> = INT16;
-template <>
-constexpr int kMemoryType<fcomplex> = FLOAT_COMPLEX;
-template <>
-constexpr int kMemoryType<dcomplex> = DOUBLE_COMPLEX;
-
-template <typename T>
-T sample_value(int line, int sample) {
-    if constexpr (requires(T value) { value.real(); }) {
-        using Part = typename T::value_type;
-        return {static_cast<Part>(test::part_value(line, sample, 0)),
-                static_cast<Part>(test::part_value(line, sample, 1))};
-    } else {
-        return static_cast<T>(test::part_value(line, sample, 0));
+/** readbuffer() of a memory type; false for one that has none. */
+bool read_block(BufferFile& file, int memory, char* to) {
+    const auto read = [&](auto* typed) { return file.readbuffer(typed, 0, kLines, 0, 0), true; };
+    switch (memory) {
+        case FLOAT_COMPLEX:
+            return read(reinterpret_cast<fcomplex*>(to));
+        case FLOAT32:
+            return read(reinterpret_cast<float*>(to));
+        case DOUBLE_COMPLEX:
+            return read(reinterpret_cast<dcomplex*>(to));
+        case FLOAT64:
+            return read(reinterpret_cast<double*>(to));
+        case INT32:
+            return read(reinterpret_cast<int*>(to));
+        case INT16:
+            return read(reinterpret_cast<short*>(to));
+        default:
+            return false;
     }
 }
-
-bool block_reads(int file, int memory) { return file <= INT16 && complex_type(file) == complex_type(memory); }
-bool block_writes(int file, int memory) {
-    if (memory == FLOAT_COMPLEX) return file == FLOAT_COMPLEX || file == INT_COMPLEX || file == SHORT_COMPLEX;
-    if (memory == FLOAT64) return file == FLOAT64 || file == INT32 || file == INT16;
-    return block_reads(file, memory);
+void write_block(BufferFile& file, int memory, const char* from) {
+    const auto write = [&](const auto* typed) { file.writebuffer(typed, 0, kLines, 0, kSamples); };
+    if (memory == FLOAT_COMPLEX) write(reinterpret_cast<const fcomplex*>(from));
+    if (memory == FLOAT32) write(reinterpret_cast<const float*>(from));
+    if (memory == DOUBLE_COMPLEX) write(reinterpret_cast<const dcomplex*>(from));
+    if (memory == FLOAT64) write(reinterpret_cast<const double*>(from));
+    if (memory == INT32) write(reinterpret_cast<const int*>(from));
+    if (memory == INT16) write(reinterpret_cast<const short*>(from));
 }
 
-template <typename T>
-void check_blocks(int type, int order, const test::Report& report) {
-    constexpr int kMemory = kMemoryType<T>;
-    SCOPED_TRACE(std::to_string(type) + " and memory type " + std::to_string(kMemory));
-    BufferFile file{report.file("block" + std::to_string(type)).c_str()};
-    file.NrOfLinesPerImage = kLines;
-    file.NrOfPixelsPerLine = kSamples;
-    file.CellType = type;
-    file.ByteOrder = order;
-    file.RowPrefix = 3;
-    char name[512];
-    file.getFilename(name);
-    const std::string content = test::raster_bytes(file);
-    test::write_text(name, content);
+TEST_P(EveryPair, IsMovedByBlocksAsTold) {
+    for (const Access& access : kAccesses) {
+        for (int type = 0; type <= INT8; ++type) {
+            SCOPED_TRACE(testing::Message() << "file " << type << ", memory " << access.memory);
+            const std::string packed = bytes_of(access.memory, 0, 0, true), untouched(packed.size(), 'U');
+            std::string memory = untouched;
+            BufferFile file{name_.c_str()};
+            start(file, type, bytes_of(type, GetParam(), kPrefix, true));
+            file.open(BufferFile::READ);
+            if (!read_block(file, access.memory, memory.data())) continue;
+            expect(memory, lists(access.block_reads, type), packed, untouched);
+            memory = untouched;
+            file.open(BufferFile::READ_WRITE);
+            read_block(file, access.memory, memory.data());
+            expect(memory, lists(access.block_reads, type), packed, untouched);
 
-    std::vector<T> values(kLines * kSamples, sample_value<T>(1000, 1000)), expected;
-    const std::vector<T> untouched = values;
-    for (int line = 0; line < kLines; ++line) {
-        for (int sample = 0; sample < kSamples; ++sample) expected.push_back(sample_value<T>(line, sample));
-    }
-    file.open(BufferFile::READ);
-    file.readbuffer(values.data(), 0, kLines, 0, 0);
-    EXPECT_EQ(values, block_reads(type, kMemory) ? expected : untouched);
-    file.close();
-
-    if (type == FLOAT64 && kMemory == FLOAT_COMPLEX) return;  // has a test of its own
-    std::string blank = content;
-    std::ranges::replace_if(
-        blank, [](char) { return true; }, '.');
-    test::write_text(name, blank);
-    file.open(BufferFile::READ_WRITE);
-    file.writebuffer(expected.data(), 0, kLines, 0, kSamples);
-    file.close();
-    std::string written = blank;
-    if (block_writes(type, kMemory)) {
-        const std::size_t line = content.size() / kLines;
-        for (std::size_t i = 0; i < kLines; ++i)
-            written.replace(i * line + 3, line - 3, content, i * line + 3, line - 3);
-    }
-    EXPECT_TRUE(test::read_text(name) == written);
-}
-
-TEST_P(EveryPair, IsReadAndWrittenByBlocksAsTold) {
-    for (int type = 0; type <= 9; ++type) {
-        check_blocks<float>(type, GetParam(), report_);
-        check_blocks<double>(type, GetParam(), report_);
-        check_blocks<int>(type, GetParam(), report_);
-        check_blocks<short>(type, GetParam(), report_);
-        check_blocks<fcomplex>(type, GetParam(), report_);
-        check_blocks<dcomplex>(type, GetParam(), report_);
-    }
-}
-
-// What a region writes it must read back, for every pair that writes.
-TEST_P(EveryPair, ComesBackFromWhatARegionWrote) {
-    for (int type = 0; type <= INT16; ++type) {
-        for (int memory = 0; memory <= INT16; ++memory) {
-            SCOPED_TRACE(std::to_string(memory) + " into " + std::to_string(type));
-            DataFile file;
-            describe(file, type);
-            file.setFilename(report_.file("written").c_str());
-            ASSERT_EQ(file.open(1), 0);
-            std::string bytes;
-            for (int i = 0; i < kLines * kSamples; ++i) {
-                for (int part = 0; part <= (complex_type(memory) ? 1 : 0); ++part) {
-                    test::append_part(bytes, memory, test::part_value(i / kSamples, i % kSamples, part), false);
-                }
-            }
-            const test::CapturedStderr silent;
-            const int status = BufferIO{&file, 0, kSamples, 0, kLines, memory}.writebuffer(bytes.data(), kSamples);
-            ASSERT_EQ(file.close(), 0);
-            if (status != 0) {
-                EXPECT_NE(complex_type(memory), complex_type(type)) << "only real and complex do not mix";
-                continue;
-            }
-            std::string back(static_cast<std::size_t>(kLines * kSamples * size_of(type)), '\0');
-            ASSERT_EQ((BufferIO{&file, 0, kSamples, 0, kLines, type}.readbuffer(back.data(), kSamples)), 0);
-            ASSERT_EQ(file.close(), 0);
-            const int parts = complex_type(type) ? 2 : 1;
-            for (int i = 0; i < kLines * kSamples * parts; ++i) {
-                const int pixel = i / parts, part = i % parts;
-                const double expected = part == 1 && !complex_type(memory)
-                                            ? 0.0
-                                            : test::part_value(pixel / kSamples, pixel % kSamples, part);
-                ASSERT_EQ(part_at(back, type, static_cast<std::size_t>(i)), expected) << i;
-            }
+            if (access.memory == FLOAT_COMPLEX && type == FLOAT64) continue;
+            const std::string written = bytes_of(type, GetParam(), kPrefix, true), blank(written.size(), '.');
+            start(file, type, blank);
+            write_block(file, access.memory, packed.data());
+            file.close();
+            expect(test::read_text(name_), lists(access.block_writes, type), written, blank);
         }
     }
 }
@@ -243,86 +160,97 @@ INSTANTIATE_TEST_SUITE_P(Orders, EveryPair, testing::Values(0, 1),
 
 struct RoundingRow {
     double value;
-    int to_int, to_short;
+    int from_double, from_float, to_short;
 };
 constexpr double kInfinity = std::numeric_limits<double>::infinity();
+// Single precision has bounds of its own: the largest float below 2^31.
+constexpr int kMax = 2147483647, kMin = -kMax - 1, kMaxFloat = 2147483520;
 constexpr RoundingRow kRounding[] = {
-    {2.5, 3, 3},
-    {-2.5, -3, -3},
-    {2.4999997, 2, 2},
-    {0.49999997, 0, 0},
-    {-0.5, -1, -1},
-    {0.0, 0, 0},
-    {32767.4, 32767, 32767},
-    {32767.5, 32768, 32767},
-    {-32768.5, -32769, -32768},
-    {3e9, 2147483647, 32767},
-    {-3e9, -2147483647 - 1, -32768},
-    {1e300, 2147483647, 32767},
-    {kInfinity, 2147483647, 32767},
-    {-kInfinity, -2147483647 - 1, -32768},
-    {std::numeric_limits<double>::quiet_NaN(), 0, 0},
+    {2.5, 3, 3, 3},
+    {-2.5, -3, -3, -3},
+    {2.4999997, 2, 2, 2},
+    {0.49999997, 0, 0, 0},
+    {-0.5, -1, -1, -1},
+    {0.0, 0, 0, 0},
+    {32767.4, 32767, 32767, 32767},
+    {32767.5, 32768, 32768, 32767},
+    {-32768.5, -32769, -32769, -32768},
+    {8388607.5, 8388608, 8388608, 32767},
+    {2147483520.0, 2147483520, kMaxFloat, 32767},
+    {2147483648.0, kMax, kMaxFloat, 32767},
+    {-2147483648.0, kMin, kMin, -32768},
+    {-3e9, kMin, kMin, -32768},
+    {1e38, kMax, kMaxFloat, 32767},
+    {kInfinity, kMax, kMaxFloat, 32767},
+    {-kInfinity, kMin, kMin, -32768},
+    {std::numeric_limits<double>::quiet_NaN(), 0, 0, 0},
 };
+constexpr int kRows = static_cast<int>(std::size(kRounding));
 
-TEST(BlockRounding, IsHalfAwayFromZeroHeldAtTheBounds) {
-    const test::Report report;
-    BufferFile file{report.file("doubles").c_str()};
+/** Values through a file of one type: written as they are, read back as another type. */
+template <typename Out, typename In>
+std::vector<Out> through(const std::string& name, int cell_type, const std::vector<In>& values) {
+    BufferFile file{name.c_str()};
     file.NrOfLinesPerImage = 1;
-    file.NrOfPixelsPerLine = static_cast<int>(std::size(kRounding));
-    file.CellType = FLOAT64;
-    std::string content;
-    for (const RoundingRow& row : kRounding) test::append_bytes(content, row.value, false);
-    test::write_text(report.file("doubles"), content);
-    file.open(BufferFile::READ);
-    std::vector<int> ints(std::size(kRounding));
-    std::vector<short> shorts(std::size(kRounding));
-    file.readbuffer(ints.data(), 0, 1, 0, 0);
-    file.readbuffer(shorts.data(), 0, 1, 0, 0);
-    for (std::size_t i = 0; i < std::size(kRounding); ++i) {
-        EXPECT_EQ(ints[i], kRounding[i].to_int) << kRounding[i].value;
-        EXPECT_EQ(shorts[i], kRounding[i].to_short) << kRounding[i].value;
-    }
-}
-
-// Single precision has bounds of its own: the largest float below 2^31, and halves that float still has.
-TEST(BlockRounding, HoldsForFloatsToo) {
-    const test::Report report;
-    BufferFile file{report.file("floats").c_str()};
-    const std::vector<float> values{2.5F,           -2.5F,         0.49999997F,
-                                    8388607.5F,     2147483520.0F, 2147483648.0F,
-                                    -2147483648.0F, -3e9F,         std::numeric_limits<float>::quiet_NaN(),
-                                    32767.5F};
-    file.NrOfLinesPerImage = 1;
-    file.NrOfPixelsPerLine = static_cast<int>(values.size());
-    file.CellType = FLOAT32;
+    file.NrOfPixelsPerLine = kRows;
+    file.CellType = cell_type;
     file.open(BufferFile::WRITE);
     file.writebuffer(values.data(), 0, 1, 0, 0);
-    file.close();
+    std::vector<Out> back(values.size(), Out{77});
+    file.readbuffer(back.data(), 0, 1, 0, 0);
+    EXPECT_EQ(back[0], Out{77}) << "a file that is only written";
     file.open(BufferFile::READ);
-    std::vector<int> ints(values.size());
-    file.readbuffer(ints.data(), 0, 1, 0, 0);
-    const std::vector<int> expected{3, -3,   0, 8388608, 2147483520, 2147483520, -2147483647 - 1, -2147483647 - 1,
-                                    0, 32768};
-    EXPECT_EQ(ints, expected);
+    file.readbuffer(back.data(), 0, 1, 0, 0);
+    return back;
 }
 
-TEST(BlockWriting, OfComplexIntoFloat64TakesTwoDoublesASample) {
-    const test::Report report;
-    BufferFile file{report.file("pairs").c_str()};
-    file.NrOfLinesPerImage = 2;
-    file.NrOfPixelsPerLine = 7;
-    file.CellType = FLOAT64;
-    file.ByteOrder = 1;
-    const std::vector<fcomplex> values{{1, 2}, {3, 4}, {5, 6}, {7, 8}, {9, 10}, {11, 12}};
-    file.open(BufferFile::WRITE);
-    file.writebuffer(values.data(), 0, 2, 0, 0);
-    file.close();
-    std::string expected;
-    for (int i = 1; i <= 12; ++i) {
-        test::append_bytes(expected, static_cast<double>(i), true);
-        if (i == 6) expected.append(8, '\0');
+// Reading rounds where the file holds real numbers, writing where it holds integers.
+TEST(BlockRounding, IsHalfAwayFromZeroHeldAtTheBounds) {
+    const test::TemporaryFolder folder;
+    const std::string name = folder.file("values");
+    std::vector<double> doubles;
+    std::vector<float> floats;
+    std::vector<int> from_double, from_float;
+    std::vector<short> shorts;
+    for (const RoundingRow& row : kRounding) {
+        doubles.push_back(row.value);
+        floats.push_back(static_cast<float>(row.value));
+        from_double.push_back(row.from_double);
+        from_float.push_back(row.from_float);
+        shorts.push_back(static_cast<short>(row.to_short));
     }
-    EXPECT_EQ(test::read_text(report.file("pairs")), expected);
+    for (const int type : {FLOAT64, INT32}) EXPECT_EQ((through<int>(name, type, doubles)), from_double);
+    for (const int type : {FLOAT64, INT16}) EXPECT_EQ((through<short>(name, type, doubles)), shorts);
+    for (const int type : {FLOAT32, INT32}) EXPECT_EQ((through<int>(name, type, floats)), from_float);
+    for (const int type : {FLOAT32, INT16}) EXPECT_EQ((through<short>(name, type, floats)), shorts);
+}
+
+// Lines with room for the pairs keep their place; others grow, so that no sample is lost.
+TEST(BlockWriting, OfComplexIntoFloat64TakesTwoDoublesASample) {
+    const test::TemporaryFolder folder;
+    const struct {
+        int width, samples, first_sample;
+        std::vector<double> file;
+    } rows[] = {{3, 0, 0, {1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12}},
+                {7, 3, 0, {1, 2, 3, 4, 5, 6, 0, 7, 8, 9, 10, 11, 12}},
+                {7, 3, 1, {0, 1, 2, 3, 4, 5, 6, 0, 7, 8, 9, 10, 11, 12}},
+                {4, 3, 1, {0, 1, 2, 3, 4, 5, 6, 0, 7, 8, 9, 10, 11, 12}},
+                {3, 3, 1, {}}};
+    const std::vector<fcomplex> values{{1, 2}, {3, 4}, {5, 6}, {7, 8}, {9, 10}, {11, 12}};
+    for (const auto& row : rows) {
+        const std::string name = folder.file(std::to_string(row.width) + std::to_string(row.first_sample));
+        BufferFile file{name.c_str()};
+        file.NrOfLinesPerImage = 2;
+        file.NrOfPixelsPerLine = row.width;
+        file.CellType = FLOAT64;
+        file.ByteOrder = 1;
+        file.open(BufferFile::WRITE);
+        file.writebuffer(values.data(), 0, 2, row.first_sample, row.samples);
+        file.close();
+        std::string expected;
+        for (const double value : row.file) test::append_bytes(expected, value, true);
+        EXPECT_EQ(test::read_text(name), expected) << row.width << ' ' << row.first_sample;
+    }
 }
 
 }  // namespace

@@ -4,14 +4,18 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <climits>
 #include <cstring>
 #include <filesystem>
 #include <numeric>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "support/diagnostics.h"
+#include "support/fields.h"
+#include "support/full_disk.h"
 #include "support/raster.h"
 
 namespace {
@@ -25,77 +29,97 @@ void describe(RasterDescription& raster, int lines, int samples, int type, int o
     raster.HeaderOffset = offset;
 }
 
-TEST(DataFileHeader, ComesBackFromTheXmlForm) {
+std::vector<int64_t> values_of(const RasterDescription& raster) {
+    return {raster.NrOfLinesPerImage, raster.NrOfPixelsPerLine, raster.HeaderOffset,
+            raster.RowPrefix,         raster.ByteOrder,         raster.CellType};
+}
+
+// One side file for both classes: what either writes, either reads.
+TEST(SideFile, ComesBackFieldByFieldInBothClasses) {
     const test::Report report;
-    const std::string name = report.file("scene.raw");
-    DataFile written, read;
-    written.setFilename(name.c_str());
-    describe(written, 17, 23, SHORT_COMPLEX, 1, 5, 1234);
-    ASSERT_EQ(written.write_hdr(), 0);
+    const std::string name = report.file("scene.raw"), side = name + ".hdr";
+    DataFile data, cloned;
+    BufferFile buffer{name.c_str()}, buffer_cloned;
+    data.setFilename(name.c_str());
+    describe(data, 17, 23, SHORT_COMPLEX, 1, 5, 1234);
+    ASSERT_EQ(data.write_hdr(), 0);
+    EXPECT_EQ(test::child_names(test::read_text(side), "RasterInfo"), test::field_names(data));
+    for (const int status : {buffer.readhdr(side.c_str()), buffer.readhdr(), buffer.writehdr()})
+        EXPECT_EQ(status, 0);
+    EXPECT_EQ(values_of(buffer), values_of(data));
+    buffer.NrOfLinesPerImage = 803;
+    ASSERT_EQ(buffer.writehdr(side.c_str()), 0);
+
+    DataFile read;
     read.BufferSize = 100;
     ASSERT_EQ(read.read_hdr(name.c_str()), 0);
+    EXPECT_EQ(values_of(read), values_of(buffer));
     EXPECT_STREQ(read.FileName, name.c_str());
-    EXPECT_EQ(read.NrOfLinesPerImage, 17);
-    EXPECT_EQ(read.NrOfPixelsPerLine, 23);
-    EXPECT_EQ(read.CellType, SHORT_COMPLEX);
-    EXPECT_EQ(read.ByteOrder, 1);
-    EXPECT_EQ(read.RowPrefix, 5);
-    EXPECT_EQ(read.HeaderOffset, 1234);
     EXPECT_EQ(read.BufferSize, 0);
+    EXPECT_EQ(cloned.clone(&read) + buffer_cloned.clone(&buffer), 0);
+    EXPECT_EQ(values_of(cloned), values_of(read));
+    EXPECT_EQ(values_of(buffer_cloned), values_of(buffer));
+    char copied[512];
+    buffer_cloned.getFilename(copied);
+    EXPECT_EQ(copied, name);
+    EXPECT_STREQ(cloned.FileName, name.c_str());
     EXPECT_TRUE(report.entries().empty());
 
-    written.HeaderOffset = int64_t{1} << 40;
     const test::CapturedStderr silent;
-    EXPECT_EQ(written.write_hdr(), 1) << "the side file holds 32 bits";
+    const std::string whole = test::read_text(side);
+    data.HeaderOffset = buffer.HeaderOffset = int64_t{1} << 40;
+    EXPECT_EQ(data.write_hdr(), 1) << "the side file holds 32 bits";
+    EXPECT_EQ(buffer.writehdr(), 1);
+    {
+        const test::FullDisk full{10};
+        EXPECT_EQ(read.write_hdr(), 1);
+        EXPECT_EQ(buffer_cloned.writehdr(), 1);
+    }
+    EXPECT_EQ(test::read_text(side), whole);
+    EXPECT_EQ(buffer.readhdr("x"), 1);
+    EXPECT_EQ(buffer.readhdr(report.file("missing.hdr").c_str()), 1);
 }
 
 struct ProfileHeader {
-    const char *name, *type, *order;
+    const char *type, *order;
     int status, code, big;
 };
-const ProfileHeader kProfileHeaders[] = {
-    {"BigFloatComplex", "FLOAT_COMPLEX", "MSBFirst", 0, 0, 1},
-    {"Float32", "FLOAT32", "LSBFirst", 0, 1, 0},
-    {"DoubleComplex", "DOUBLE_COMPLEX", "MSBFirst", 0, 2, 1},
-    {"Float64", "FLOAT64", "MSBFirst", 0, 3, 1},
-    {"Int32", "INT32", "MSBFirst", 0, 5, 1},
-    {"ShortComplex", "SHORT_COMPLEX", "MSBFirst", 0, 6, 1},
-    {"Int16", "INT16", "MSBFirst", 0, 7, 1},
-    {"Int8Complex", "INT8_COMPLEX", "MSBFirst", 0, 8, 1},
-    {"Int8", "INT8", "MSBFirst", 0, 9, 1},
-    {"LowerCaseOrder", "INT16", "msbfirst", 0, 7, 0},
-    {"LowerCaseType", "int16", "MSBFirst", 1, -1, 1},
-    {"Code", "4", "MSBFirst", 1, -1, 1},
+constexpr ProfileHeader kProfileHeaders[] = {
+    {"FLOAT_COMPLEX", "MSBFirst", 0, 0, 1},
+    {"FLOAT32", "LSBFirst", 0, 1, 0},
+    {"DOUBLE_COMPLEX", "MSBFirst", 0, 2, 1},
+    {"FLOAT64", "MSBFirst", 0, 3, 1},
+    {"INT32", "MSBFirst", 0, 5, 1},
+    {"SHORT_COMPLEX", "MSBFirst", 0, 6, 1},
+    {"INT16", "MSBFirst", 0, 7, 1},
+    {"INT8", "MSBFirst", 0, 9, 1},
+    {"INT8_COMPLEX", "MSBFirst", 0, 8, 1},
+    {"INT16", "msbfirst", 0, 7, 0},
+    {"INT16", "", 1, 7, 0},
+    {"int16", "MSBFirst", 1, -1, 1},
+    {"4", "MSBFirst", 1, -1, 1},
+    {"", "MSBFirst", 1, -1, 1},
 };
-class DataFileProfileHeader : public testing::TestWithParam<ProfileHeader> {};
 
-TEST_P(DataFileProfileHeader, MapsNamesExactly) {
+TEST(SideFile, OfTheProfileFormNamesItsType) {
     const test::Report report;
     const test::CapturedStderr silent;
-    const std::string name = report.file("scene.raw");
-    test::write_text(name + ".hdr",
-                     std::string{"[RasterInfo]\nHeaderOffset = 7\nRowPrefix = 3\nNrOfPixelsPerLine = 1024\n"
-                                 "NrOfLinesPerImage = 2048\nCellType = "} +
-                         GetParam().type + "\nByteOrder = " + GetParam().order + "\n");
+    std::string name = report.file("scene");
+    const auto line = [](const char* key, std::string_view value) {
+        return value.empty() ? "" : key + std::string{" = "} + std::string{value} + "\n";
+    };
     DataFile file;
-    EXPECT_EQ(file.read_hdr(name.c_str()), GetParam().status);
-    EXPECT_EQ(file.CellType, GetParam().code);
-    EXPECT_EQ(file.ByteOrder, GetParam().big);
-    EXPECT_EQ(file.NrOfPixelsPerLine, 1024);
-    EXPECT_EQ(file.HeaderOffset, 7);
-}
-INSTANTIATE_TEST_SUITE_P(Names, DataFileProfileHeader, testing::ValuesIn(kProfileHeaders),
-                         [](const auto& row) { return row.param.name; });
-
-TEST(DataFileHeader, MissingKeysFailAndKeepWhatWasFound) {
-    const test::Report report;
-    const test::CapturedStderr silent;
-    const std::string name = report.file("scene.raw");
-    test::write_text(name + ".hdr",
-                     "[RasterInfo]\nNrOfPixelsPerLine = 1024\nCellType = INT16\nByteOrder = MSBFirst\n");
-    DataFile file;
-    EXPECT_EQ(file.read_hdr(name.c_str()), 1);
-    EXPECT_EQ(file.NrOfPixelsPerLine, 1024);
+    for (const ProfileHeader& row : kProfileHeaders) {
+        SCOPED_TRACE(testing::Message() << row.type << ' ' << row.order);
+        name += 'x';  // parameter files stay in memory under their names
+        test::write_text(name + ".hdr",
+                         "[RasterInfo]\nHeaderOffset = 7\nRowPrefix = 3\nNrOfPixelsPerLine = 1024\n" +
+                             line("CellType", row.type) + line("ByteOrder", row.order) +
+                             line("NrOfLinesPerImage", row.status == 0 ? "2048" : ""));
+        file.NrOfLinesPerImage = 19;
+        EXPECT_EQ(file.read_hdr(name.c_str()), row.status);
+        EXPECT_EQ(values_of(file), (std::vector<int64_t>{row.status ? 19 : 2048, 1024, 7, 3, row.big, row.code}));
+    }
     EXPECT_EQ(file.read_hdr(report.file("missing").c_str()), 1);
     EXPECT_EQ(file.read_hdr(std::string(600, 'x').c_str()), 1);
 }
@@ -112,127 +136,146 @@ protected:
         file_.BufferSize = buffer;
         ASSERT_EQ(file_.open(mode), 0);
     }
-    // The next n bytes start with `first`.
-    void expect_bytes(int first, int n) {
-        std::string bytes(static_cast<std::size_t>(n), '\0');
-        ASSERT_EQ(file_.read(bytes.data(), n), 0);
-        EXPECT_EQ(bytes, content_.substr(static_cast<std::size_t>(first), static_cast<std::size_t>(n)));
-    }
     test::Report report_;
     std::string name_ = report_.file("bytes.raw"), content_;
     DataFile file_;
 };
 
-TEST_F(DataFileBytes, AreReadInOrderWithAnyBuffer) {
-    for (const int buffer : {0, 1, 7, 16, 60, 100}) {
-        SCOPED_TRACE(buffer);
-        open(0, buffer);
-        EXPECT_EQ(file_.is_buffered(), buffer > 0 ? 1 : 0);
-        int place = 0;
-        for (const int n : {1, 3, 0, 20, 7, 2, 27}) {
-            expect_bytes(place, n);
-            place += n;
-            EXPECT_EQ(file_.tell(), place);
-        }
-        const test::CapturedStderr silent;
-        char more = 0;
-        EXPECT_EQ(file_.read(&more, 1), 4);
-        EXPECT_EQ(file_.close(), 0);
-        EXPECT_EQ(file_.BufferSize, 0) << "a closed file is unbuffered";
-    }
-}
+/** One request, and the place afterwards. */
+struct Step {
+    char what;  // 'r' reads and 'w' writes n bytes, 's' seeks by n
+    int64_t n;
+    int64_t tell;
+    int whence = 0, status = 0;
+};
+struct Sequence {
+    const char* name;
+    int mode;
+    std::vector<int> buffers;
+    std::vector<Step> steps;
+};
+const std::vector<int> kBuffers = {0, 1, 7, 16, 60, 100};
+constexpr int64_t kFar = int64_t{1} << 40;
+const Sequence kSequences[] = {
+    {"Read",
+     0,
+     kBuffers,
+     {{'r', 1, 1}, {'r', 3, 4}, {'r', 0, 4}, {'r', 20, 24}, {'r', 36, 60}, {'r', 1, 60, 0, 4}}},
+    {"Create", 1, kBuffers, {{'w', 1, 1}, {'w', 3, 4}, {'w', 0, 4}, {'w', 20, 24}, {'w', 7, 31}, {'w', 2, 33}}},
+    {"Update", 2, kBuffers, {{'w', 1, 1}, {'w', 3, 4}, {'w', 0, 4}, {'w', 20, 24}, {'w', 7, 31}, {'w', 2, 33}}},
+    {"Both",
+     3,
+     kBuffers,
+     {{'r', 4, 4},
+      {'w', 2, 6},
+      {'r', 3, 9},
+      {'w', 1, 10},
+      {'w', 9, 19},
+      {'r', 13, 32},
+      {'w', 3, 35},
+      {'r', 2, 37}}},
+    {"SeekUnbuffered",
+     0,
+     {0},
+     {{'s', 10, 10},
+      {'r', 5, 15},
+      {'s', -3, 12, 1},
+      {'r', 2, 14},
+      {'s', 0, 14, 2, 1},
+      {'s', -15, 14, 1, 1},
+      {'s', kFar, kFar}}},
+    // Outside the buffer, a relative step counts from its start, here 40, and not from the cursor.
+    {"SeekReading",
+     0,
+     {16},
+     {{'r', 4, 4},
+      {'s', 3, 7, 1},
+      {'r', 1, 8},
+      {'s', 2, 2},
+      {'r', 2, 4},
+      {'s', 40, 40},
+      {'r', 3, 43},
+      {'s', -5, 35, 1},
+      {'r', 2, 37},
+      {'s', 0, 37, 3, 1},
+      {'s', -1000, 37, 1, 1}}},
+    // Writing, any step counts from the buffer's start, whatever the whence.
+    {"SeekWriting", 2, {16}, {{'w', 2, 2}, {'s', 10, 10}, {'w', 2, 12}, {'s', 10, 20, 1}, {'w', 1, 21}}},
+    {"SeekBoth", 3, {16}, {{'r', 4, 4}, {'s', 10, 10}, {'w', 2, 12}, {'r', 1, 13}, {'s', 5, 17, 1}, {'r', 3, 20}}},
+};
 
-TEST_F(DataFileBytes, UnbufferedSeeksFromStartAndPlace) {
-    open(0, 0);
-    EXPECT_EQ(file_.seek(10, 0), 0);
-    expect_bytes(10, 5);
-    EXPECT_EQ(file_.seek(-3, 1), 0);
-    expect_bytes(12, 2);
+// The contents are those of a plain file. Once, in mode 3, bytes that were only read were written back where the
+// buffer ended, and pending ones were lost to the next read.
+TEST_F(DataFileBytes, AreMovedAsInAPlainFile) {
     const test::CapturedStderr silent;
-    EXPECT_EQ(file_.seek(0, 2), 1);
-    EXPECT_EQ(file_.seek(-100, 1), 1);
-    EXPECT_EQ(file_.tell(), 14);
-    EXPECT_EQ(file_.seek(int64_t{1} << 40, 0), 0);
-    EXPECT_EQ(file_.tell(), int64_t{1} << 40);
-}
-
-TEST_F(DataFileBytes, BufferedReadingSeeksAsTold) {
-    open(0, 16);
-    expect_bytes(0, 4);  // buffer 0..15, cursor 4
-    EXPECT_EQ(file_.seek(3, 1), 0);
-    expect_bytes(7, 1);
-    EXPECT_EQ(file_.seek(2, 0), 0);  // within
-    expect_bytes(2, 2);
-    EXPECT_EQ(file_.seek(40, 0), 0);  // outside: the buffer starts there
-    EXPECT_EQ(file_.tell(), 40);
-    expect_bytes(40, 3);
-    // Outside by a relative step: measured from the buffer's start at 40, not from the cursor at 43.
-    EXPECT_EQ(file_.seek(-5, 1), 0);
-    expect_bytes(35, 2);
-    const test::CapturedStderr silent;
-    EXPECT_EQ(file_.seek(0, 3), 1);
-    EXPECT_EQ(file_.seek(-1000, 1), 1);
-}
-
-TEST_F(DataFileBytes, BufferedWritingReachesTheFile) {
-    for (const int mode : {1, 2}) {
-        for (const int buffer : {0, 1, 7, 64}) {
-            SCOPED_TRACE(buffer);
+    for (const Sequence& sequence : kSequences) {
+        for (const int buffer : sequence.buffers) {
+            SCOPED_TRACE(testing::Message() << sequence.name << ' ' << buffer);
             test::write_text(name_, content_);
-            open(mode, buffer);
-            EXPECT_EQ(file_.is_writing(), 1);
-            std::string written;
-            for (const int n : {1, 3, 0, 20, 7, 2}) {
-                const std::string piece(static_cast<std::size_t>(n), static_cast<char>('A' + n));
-                ASSERT_EQ(file_.write(piece.data(), n), 0);
-                written += piece;
-                EXPECT_EQ(file_.tell(), static_cast<int64_t>(written.size()));
+            std::string plain = sequence.mode == 1 ? "" : content_;
+            open(sequence.mode, buffer);
+            EXPECT_EQ(file_.is_buffered(), buffer > 0 ? 1 : 0);
+            EXPECT_EQ(file_.is_writing(), sequence.mode == 3 ? 2 : sequence.mode > 0 ? 1 : 0);
+            for (const Step& step : sequence.steps) {
+                const auto n = static_cast<std::size_t>(step.n), before = static_cast<std::size_t>(file_.tell());
+                std::string bytes(step.what == 's' ? 0 : n, static_cast<char>('A' + before));
+                if (step.what == 's') {
+                    EXPECT_EQ(file_.seek(step.n, step.whence), step.status);
+                } else if (step.what == 'w') {
+                    EXPECT_EQ(file_.write(bytes.data(), step.n), step.status);
+                    plain.replace(before, n, bytes);
+                } else {
+                    EXPECT_EQ(file_.read(bytes.data(), step.n), step.status);
+                    EXPECT_TRUE(step.status != 0 || bytes == plain.substr(before, n));
+                }
+                EXPECT_EQ(file_.tell(), step.tell);
             }
-            ASSERT_EQ(file_.close(), 0);
-            const std::string rest = mode == 1 ? "" : content_.substr(written.size());
-            EXPECT_EQ(test::read_text(name_), written + rest);
+            if (sequence.mode == 3) {  // writes what is pending
+                EXPECT_EQ(file_.seek(0, 1), 0);
+            }
+            EXPECT_EQ(file_.close(), 0);
+            EXPECT_EQ(test::read_text(name_), plain);
+            EXPECT_EQ(file_.BufferSize, 0) << "a closed file is unbuffered";
         }
     }
-}
-
-TEST_F(DataFileBytes, BufferedWritingSeeksRelativeForEitherWhence) {
-    open(2, 16);
-    ASSERT_EQ(file_.write("AB", 2), 0);
-    ASSERT_EQ(file_.seek(10, 0), 0);
-    EXPECT_EQ(file_.tell(), 10);
-    ASSERT_EQ(file_.write("CD", 2), 0);
-    ASSERT_EQ(file_.seek(10, 0), 0);
-    EXPECT_EQ(file_.tell(), 20);
-    ASSERT_EQ(file_.close(), 0);
-    std::string expected = content_;
-    expected.replace(0, 2, "AB").replace(10, 2, "CD");
-    EXPECT_EQ(test::read_text(name_), expected);
 }
 
 TEST_F(DataFileBytes, ReadingAndWritingDropsAPendingBufferOnClose) {
     open(3, 16);
-    EXPECT_EQ(file_.is_writing(), 2);
     ASSERT_EQ(file_.write("AB", 2), 0);
     ASSERT_EQ(file_.close(), 0);
     EXPECT_EQ(test::read_text(name_), content_);
 }
 
+// Requests that the access state does not allow: in a row, closed and opened in modes 0 to 3.
 TEST_F(DataFileBytes, WrongStatesAreRefused) {
     const test::CapturedStderr silent;
-    char byte = 0;
-    EXPECT_EQ(file_.read(&byte, 1), 1);
-    EXPECT_EQ(file_.write(&byte, 1), 1);
+    char bytes[12] = {};
+    describe(file_, 2, 3, INT16, 0, 0, 0);
+    BufferIO region{&file_, 0, 3, 0, 2, INT16};
     EXPECT_EQ(file_.seek(1, 0), 1);
-    EXPECT_EQ(file_.close(), 0);
-    EXPECT_EQ(file_.open(7), 0);
-    EXPECT_EQ(file_.open(-1), 0);
+    EXPECT_EQ(file_.close() + file_.open(7) + file_.open(-1), 0);
     EXPECT_EQ(file_.is_open(), 0);
-    open(0, 0);
-    EXPECT_EQ(file_.write(&byte, 1), 1);
-    EXPECT_EQ(file_.read(&byte, -1), 1);
-    open(2, 0);
-    EXPECT_EQ(file_.read(&byte, 1), 1);
-    EXPECT_EQ(test::read_text(name_), content_);
+    for (const int mode : {-1, 0, 1, 2, 3}) {
+        SCOPED_TRACE(mode);
+        test::write_text(name_, content_);
+        if (mode >= 0) open(mode, 0);
+        const int reads = mode == 0 || mode == 3 ? 0 : 1, writes = mode > 0 ? 0 : 1;
+        EXPECT_EQ(file_.read(bytes, 1), reads);
+        EXPECT_EQ(file_.write(bytes, 1), writes);
+        EXPECT_EQ(file_.read(bytes, -1), 1);
+        EXPECT_EQ(file_.write(bytes, -1), 1);
+        EXPECT_EQ(region.writebuffer(bytes), writes);
+        EXPECT_EQ(region.writeprefix(bytes), writes);
+        EXPECT_EQ((BufferIO{&file_, 0, 1, 0, 1, FLOAT_COMPLEX}.writebuffer(bytes)), 1) << "complex into real";
+        if (mode < 0) continue;
+        EXPECT_EQ(region.readbuffer(bytes, 3), reads);
+        EXPECT_EQ(region.readprefix(bytes), reads);
+        describe(file_, 2, 3, FLOAT_COMPLEX, 0, 0, 0);
+        EXPECT_EQ((BufferIO{&file_, 0, 3, 0, 9, INT16}.readbuffer(bytes, 3)), reads == 1 ? 1 : 4)
+            << "file too short";
+        describe(file_, 2, 3, INT16, 0, 0, 0);
+    }
 }
 
 TEST_F(DataFileBytes, WhatCannotBeOpenedGivesNine) {
@@ -240,6 +283,7 @@ TEST_F(DataFileBytes, WhatCannotBeOpenedGivesNine) {
     file_.setFilename(report_.file("missing").c_str());
     EXPECT_EQ(file_.exists(), 0);
     for (const int mode : {0, 2, 3}) EXPECT_EQ(file_.open(mode), 9);
+    EXPECT_EQ((BufferIO{&file_, 0, 3, 0, 2, INT16}.readprefix(name_.data())), 9);
     file_.setFilename(report_.folder().path().c_str());
     EXPECT_EQ(file_.open(0), 9) << "a folder is no raster";
     EXPECT_EQ(file_.exists(), 0);
@@ -249,81 +293,151 @@ TEST_F(DataFileBytes, WhatCannotBeOpenedGivesNine) {
     }
 }
 
-TEST_F(DataFileBytes, AFullDiskGivesFive) {
+// A write that is cut short says so in every way to write, and once there is room again nothing is missing.
+TEST_F(DataFileBytes, AFullDiskGivesFiveAndLosesNothing) {
     const test::CapturedStderr silent;
-    for (const int buffer : {0, 8}) {
-        DataFile full;
-        full.setFilename("/dev/full");
-        full.BufferSize = buffer;
-        ASSERT_EQ(full.open(2), 0);
-        const char bytes[20] = {};
-        EXPECT_EQ(full.write(bytes, 20), 5);
+    describe(file_, 4, 15, INT16, 0, 2, 0);
+    const std::string bytes(128, 'w');
+    const struct {
+        const char* name;
+        int buffer;
+        std::ptrdiff_t bytes;
+        int (*write)(DataFile&, const char*);
+    } writers[] = {
+        {"write", 0, 128, [](DataFile& f, const char* from) { return f.write(from, 128); }},
+        {"write buffered", 16, 128, [](DataFile& f, const char* from) { return f.write(from, 128); }},
+        {"close", 200, 128, [](DataFile& f, const char* from) { return f.write(from, 128) + f.close(); }},
+        {"seek", 200, 128, [](DataFile& f, const char* from) { return f.write(from, 128) + f.seek(0, 1); }},
+        {"writebuffer", 0, 120,
+         [](DataFile& f, const char* from) { return BufferIO{&f, 0, 15, 0, 4, INT16}.writebuffer(from); }},
+        {"writeprefix", 0, 8,
+         [](DataFile& f, const char* from) { return BufferIO{&f, 0, 15, 0, 4, INT16}.writeprefix(from); }},
+    };
+    for (const auto& writer : writers) {
+        SCOPED_TRACE(writer.name);
+        open(1, writer.buffer);
+        {
+            const test::FullDisk full{37};
+            EXPECT_EQ(writer.write(file_, bytes.data()), 5);
+            EXPECT_EQ(file_.is_open(), 1);
+        }
+        if (writer.buffer < 200) {
+            EXPECT_EQ(writer.write(file_, bytes.data()), 0);
+        }
+        ASSERT_EQ(file_.close(), 0);
+        const std::string written = test::read_text(name_);
+        EXPECT_EQ(std::count(written.begin(), written.end(), 'w'), writer.bytes);
     }
+    file_.setFilename("/dev/full");  // there the report has room
+    open(2, 0);
+    EXPECT_EQ(file_.write("w", 1), 5);
     EXPECT_THAT(report_.messages("ERROR"), testing::Contains("File writing failed!"));
 }
 
-TEST_F(DataFileBytes, CopyAndCloneTakeTheDescription) {
-    describe(file_, 4, 15, INT8, 0, 0, 0);
-    const std::string other = report_.file("copy.raw");
-    ASSERT_EQ(file_.copy(other.c_str()), 0);
-    EXPECT_EQ(test::read_text(other), content_);
-    DataFile read;
-    ASSERT_EQ(read.read_hdr(other.c_str()), 0);
-    EXPECT_EQ(read.NrOfPixelsPerLine, 15);
-    DataFile cloned;
-    EXPECT_EQ(cloned.clone(&file_), 0);
-    EXPECT_STREQ(cloned.FileName, name_.c_str());
-    EXPECT_EQ(cloned.NrOfLinesPerImage, 4);
-    EXPECT_EQ(cloned.is_open(), 0);
-
+TEST_F(DataFileBytes, CopiesAreWholeOrNotThere) {
     const test::CapturedStderr silent;
-    EXPECT_EQ(file_.copy(other.c_str(), 0), 1);
-    EXPECT_EQ(file_.copy(name_.c_str()), 1) << "onto itself";
+    describe(file_, 4, 15, INT8, 0, 0, 0);
+    BufferFile buffer{name_.c_str()};
+    buffer.copyDescription(file_);
+    const auto check = [&](auto copy, const std::string& other) {
+        test::write_text(other, "older");
+        EXPECT_EQ(copy(other, 0), 1) << "not to be overwritten";
+        EXPECT_EQ(copy(name_, 1), 1) << "onto itself";
+        EXPECT_EQ(copy(report_.file("no/copy.raw"), 1), 9);
+        {
+            const test::FullDisk full{37};
+            EXPECT_EQ(copy(other, 1), 5);
+        }
+        EXPECT_EQ(test::read_text(other), "older");
+        EXPECT_FALSE(std::filesystem::exists(other + ".hdr"));
+        ASSERT_EQ(copy(other, 1), 0);
+        EXPECT_EQ(test::read_text(other), content_);
+        DataFile read;
+        EXPECT_EQ(read.read_hdr(other.c_str()), 0);
+        EXPECT_EQ(values_of(read), values_of(file_));
+    };
+    check([&](const std::string& to, int over) { return file_.copy(to.c_str(), over); }, report_.file("a.raw"));
+    check([&](const std::string& to, int over) { return buffer.copy(to.c_str(), over); }, report_.file("b.raw"));
     EXPECT_EQ(test::read_text(name_), content_);
-    EXPECT_EQ(file_.copy(report_.file("no/copy.raw").c_str()), 9);
+    const auto files = std::filesystem::directory_iterator{report_.folder().path()};
+    EXPECT_EQ(std::distance(begin(files), end(files)), 6)
+        << "two copies, their side files, the raster, the report";
 }
 
 struct Hostile {
-    const char* name;
     int lines, samples, type, prefix;
     int64_t offset;
     int status;
 };
-const Hostile kHostile[] = {
-    {"NegativeLines", -1, 10, INT16, 0, 0, 1},
-    {"NegativeSamples", 1, -10, INT16, 0, 0, 1},
-    {"NegativePrefix", 1, 10, INT16, -4, 0, 1},
-    {"NegativeOffset", 1, 10, INT16, 0, -4, 1},
-    {"UnknownType", 1, 10, 42, 0, 0, 1},
-    {"MinusOneType", 1, 10, -1, 0, 0, 1},
-    {"EightBit", 1, 10, INT8, 0, 0, 1},
-    {"LongerThanTheFile", 2, 29, INT16, 3, 1, 4},
-    {"Overflow32", INT_MAX, INT_MAX, INT16, 0, 0, 4},
-    {"Overflow64", INT_MAX, INT_MAX, DOUBLE_COMPLEX, INT_MAX, LLONG_MAX - 5, 1},
+constexpr Hostile kHostile[] = {
+    {-1, 10, INT16, 0, 0, 1},
+    {1, -10, INT16, 0, 0, 1},
+    {1, 10, INT16, -4, 0, 1},
+    {1, 10, INT16, 0, -4, 1},
+    {INT_MIN, INT_MIN, INT16, INT_MIN, INT_MIN, 1},
+    {1, 10, 42, 0, 0, 1},
+    {1, 10, -1, 0, 0, 1},
+    {1, 10, CELL_NOT_SET, 0, 0, 1},
+    {2, 29, INT16, 3, 1, 4},                                                     // longer than the file
+    {INT_MAX, INT_MAX, INT16, 0, 0, 4},                                          // 32 bits overflow
+    {INT_MAX, INT_MAX, DOUBLE_COMPLEX, INT_MAX, INT_MAX, 1},                     // 64 bits overflow
+    {INT_MAX, INT_MAX, DOUBLE_COMPLEX, INT_MAX, std::int64_t{INT_MAX} << 32, 1}  // more than a side file holds
 };
-class DataFileHostile : public testing::TestWithParam<Hostile> {};
 
-// Read as a whole image, and nothing may be touched: the destination is one byte.
-TEST_P(DataFileHostile, IsRefusedBeforeMemoryIsTaken) {
+// Through its side file, read as a whole image by either class: nothing is touched, and no memory is taken, for a
+// byte is all there is.
+TEST(HostileDescriptions, AreRefusedBeforeMemoryIsTaken) {
     const test::Report report;
     const test::CapturedStderr silent;
-    const std::string name = report.file("hostile.raw");
-    test::write_text(name, std::string(60, 'x'));
-    const Hostile& row = GetParam();
-    DataFile file;
-    file.setFilename(name.c_str());
-    describe(file, row.lines, row.samples, row.type, 0, row.prefix, row.offset);
-    char untouched = 'u';
-    BufferIO region{&file, 0, row.samples, 0, row.lines, row.type};
-    EXPECT_EQ(region.readbuffer(&untouched, row.samples), row.status);
-    EXPECT_EQ(untouched, 'u');
-    EXPECT_FALSE(report.entries("ERROR").empty());
-    if (row.status == 1 && row.type != INT8) {
-        EXPECT_EQ(file.rasterSize(), -1);
+    const std::string name = report.file("hostile.raw"), content(60, 'x');
+    test::write_text(name, content);
+    for (const Hostile& row : kHostile) {
+        SCOPED_TRACE(testing::PrintToString(row.samples) + " of " + std::to_string(row.type));
+        DataFile file;
+        file.setFilename(name.c_str());
+        describe(file, row.lines, row.samples, row.type, 0, row.prefix, row.offset);
+        if (file.write_hdr() == 0) {
+            EXPECT_EQ(file.read_hdr(name.c_str()), 0);
+        }
+        EXPECT_EQ(file.rasterSize() < 0, row.status == 1);
+        const std::size_t before = report.entries("ERROR").size();
+        char untouched = 'u';
+        BufferIO region{&file, 0, row.samples, 0, row.lines, row.type};
+        EXPECT_EQ(region.readbuffer(&untouched, row.samples), row.status);
+        EXPECT_GT(report.entries("ERROR").size(), before);
+        BufferFile buffer{name.c_str()};
+        buffer.copyDescription(file);
+        for (const int mode : {BufferFile::READ, BufferFile::READ_WRITE}) {
+            buffer.open(mode);
+            buffer.readbuffer(reinterpret_cast<short*>(&untouched), 0, row.lines, 0, row.samples);
+            buffer.readbuffer(reinterpret_cast<dcomplex*>(&untouched), 0, row.lines, 0, 0);
+            EXPECT_EQ(buffer.readInt(row.lines - 1, row.samples - 1), 0);
+        }
+        EXPECT_EQ(untouched, 'u');
+        if (row.status == 1) {
+            ASSERT_EQ(file.open(3), 0);
+            EXPECT_EQ(region.writebuffer(&untouched), 1);
+            buffer.writebuffer(reinterpret_cast<const short*>(&untouched), 0, row.lines, 0, row.samples);
+        }
+        EXPECT_EQ(test::read_text(name), content);
     }
 }
-INSTANTIATE_TEST_SUITE_P(Descriptions, DataFileHostile, testing::ValuesIn(kHostile),
-                         [](const auto& row) { return row.param.name; });
+
+// A count in the text that 32 bits do not hold does not wrap round to a small one.
+TEST(HostileDescriptions, AreNotCutToFit) {
+    const test::TemporaryFolder folder;
+    const std::string name = folder.file("scene"), side = name + ".hdr";
+    DataFile file;
+    file.setFilename(name.c_str());
+    for (const char* count : {"99999999999", "4294967297", "-4294967297", "-99999999999999999999"}) {
+        describe(file, 17, 1, INT16, 0, 0, 0);
+        ASSERT_EQ(file.write_hdr(), 0);
+        std::string text = test::read_text(side);
+        test::write_text(side, text.replace(text.find(">17<") + 1, 2, count));
+        EXPECT_EQ(file.read_hdr(name.c_str()), 0);
+        EXPECT_EQ(file.NrOfLinesPerImage, *count == '-' ? INT_MIN : INT_MAX) << count;
+    }
+}
 
 /** Every layout of prefix and header, as DataFile regions see it. */
 struct Layout {
@@ -343,9 +457,8 @@ protected:
         test::write_text(file_.FileName, bytes_);
         file_.BufferSize = GetParam().buffer;
     }
-    [[nodiscard]] std::size_t offset(int line, int sample) const {
-        return static_cast<std::size_t>(file_.HeaderOffset + line * (21 * 2 + file_.RowPrefix) + file_.RowPrefix +
-                                        sample * 2);
+    [[nodiscard]] std::size_t start(int line) const {
+        return static_cast<std::size_t>(file_.HeaderOffset + line * (21 * 2 + file_.RowPrefix));
     }
     test::Report report_;
     DataFile file_;
@@ -363,7 +476,7 @@ TEST_P(Regions, AreCutOutWithAnyRowWidth) {
                 EXPECT_EQ(static_cast<double>(values[static_cast<std::size_t>(line * width + sample)]), expected);
             }
         }
-        EXPECT_EQ(file_.tell(), static_cast<int64_t>(offset(7, 0)) - file_.RowPrefix) << "the line after";
+        EXPECT_EQ(file_.tell(), static_cast<int64_t>(start(7))) << "the line after";
     }
     const test::CapturedStderr silent;
     char untouched = 'u';
@@ -375,65 +488,30 @@ TEST_P(Regions, AreCutOutWithAnyRowWidth) {
 }
 
 TEST_P(Regions, AreWrittenIntoTheirPlaceOnly) {
-    ASSERT_EQ(file_.open(3), 0);
+    const auto prefix = static_cast<std::size_t>(file_.RowPrefix);
+    std::string prefixes(4 * prefix, '\0'), expected = bytes_, old_prefixes;
+    const std::string marks(4 * prefix, '#');
     std::vector<float> values(4 * 11);
     std::iota(values.begin(), values.end(), 1000.0F);
+    ASSERT_EQ(file_.open(3), 0);
     BufferIO region{&file_, 6, 8, 3, 4, FLOAT32};
-    ASSERT_EQ(region.writebuffer(reinterpret_cast<const char*>(values.data()), 11), 0);
-    ASSERT_EQ(file_.close(), 0);
-    std::string expected = bytes_;
-    for (int line = 0; line < 4; ++line) {
-        std::string row;
-        for (int sample = 0; sample < 8; ++sample) {
-            test::append_part(row, INT16,
-                              static_cast<double>(values[static_cast<std::size_t>(line * 11 + sample)]), true);
-        }
-        expected.replace(offset(line + 3, 6), row.size(), row);
-    }
-    EXPECT_EQ(test::read_text(file_.FileName), expected);
-}
-
-TEST_P(Regions, HavePrefixesOfTheirOwn) {
-    const auto size = static_cast<std::size_t>(3 * file_.RowPrefix);
-    std::string prefixes(size, '\0'), expected;
-    BufferIO region{&file_, 0, 21, 2, 3, INT16};
     ASSERT_EQ(region.readprefix(prefixes.data()), 0);
-    for (int line = 2; line < 5; ++line) {
-        expected += bytes_.substr(offset(line, 0) - static_cast<std::size_t>(file_.RowPrefix),
-                                  static_cast<std::size_t>(file_.RowPrefix));
-    }
-    EXPECT_EQ(prefixes, expected);
-
-    ASSERT_EQ(file_.open(2), 0);
-    const std::string marks(size, '#');
+    ASSERT_EQ(region.writebuffer(reinterpret_cast<const char*>(values.data()), 11), 0);
     ASSERT_EQ(region.writeprefix(marks.data()), 0);
     ASSERT_EQ(file_.close(), 0);
-    std::string written = bytes_;
-    for (int line = 2; line < 5; ++line) {
-        written.replace(offset(line, 0) - static_cast<std::size_t>(file_.RowPrefix),
-                        static_cast<std::size_t>(file_.RowPrefix), static_cast<std::size_t>(file_.RowPrefix), '#');
+    for (int line = 0; line < 4; ++line) {
+        const std::size_t at = start(line + 3);
+        old_prefixes += bytes_.substr(at, prefix);
+        std::string row;
+        for (int sample = 0; sample < 8; ++sample)
+            test::append_part(row, INT16, 1000.0 + line * 11 + sample, true);
+        expected.replace(at, prefix, prefix, '#').replace(at + prefix + 12, row.size(), row);
     }
-    EXPECT_EQ(test::read_text(file_.FileName), written);
+    EXPECT_EQ(prefixes, old_prefixes);
+    EXPECT_EQ(test::read_text(file_.FileName), expected);
 }
 INSTANTIATE_TEST_SUITE_P(Layouts, Regions, testing::ValuesIn(kLayouts),
                          [](const auto& row) { return row.param.name; });
-
-TEST(BufferIORegions, NeedTheRightState) {
-    const test::Report report;
-    const test::CapturedStderr silent;
-    DataFile file;
-    describe(file, 2, 3, INT16, 0, 0, 0);
-    file.setFilename(report.file("state.raw").c_str());
-    char bytes[12] = {};
-    BufferIO region{&file, 0, 3, 0, 2, INT16};
-    EXPECT_EQ(region.readbuffer(bytes, 3), 9);
-    EXPECT_EQ(region.writebuffer(bytes, 3), 1);
-    EXPECT_EQ(region.writeprefix(bytes), 1);
-    ASSERT_EQ(file.open(1), 0);
-    EXPECT_EQ(region.writebuffer(bytes, 3), 0);
-    EXPECT_EQ(region.readbuffer(bytes, 3), 1);
-    EXPECT_EQ((BufferIO{&file, 0, 3, 0, 2, FLOAT_COMPLEX}.writebuffer(bytes, 3)), 1) << "complex into real";
-}
 
 // The last line of 6 GB takes no more memory than itself, and the hole stays a hole.
 TEST(BufferIORegions, ReachBeyondFourGigabytes) {

@@ -22,6 +22,14 @@ public:
     ~QuietErrno() { errno = 0; }
 };
 
+/** Two doubles for each sample of a FLOAT64 region whose pieces begin `before` bytes after their lines. Lines
+ * without room for them become as long as they need. False when an offset overflows. */
+bool make_room_for_pairs(quo::RasterRegion& region, int64_t before) {
+    region.piece *= 2;
+    region.distance = std::max(region.distance, before + region.piece);
+    return (quo::Checked<int64_t>{region.distance} * region.count + region.first).value().has_value();
+}
+
 }  // namespace
 
 BufferFile::BufferFile() : BufferFile{""} {}
@@ -59,8 +67,7 @@ void BufferFile::open(int mode) {
 
 void BufferFile::initbuffer(int size, int keep) {
     const QuietErrno quiet;
-    if (size < 1 || !is_open()) return;
-    flush();
+    if (size < 1 || !is_open() || !flush()) return;
     buffer_.reset(new (std::nothrow) char[static_cast<std::size_t>(size)]());
     size_ = buffer_ ? size : 0;
     keep_ = mode_ == READ ? std::clamp(keep, 0, size - 1) : 0;
@@ -73,6 +80,7 @@ void BufferFile::close() {
     flush();
     buffer_.reset();
     size_ = keep_ = start_ = cursor_ = fill_ = 0;
+    dirty_first_ = dirty_last_ = 0;
     stream_->close();
     mode_ = NOT_OPEN;
 }
@@ -93,17 +101,21 @@ void BufferFile::markWritten(int64_t first, int64_t last) {
     }
 }
 
+// What could not be written stays pending.
 bool BufferFile::flush() {
     const auto pending = static_cast<std::size_t>(dirty_last_ - dirty_first_);
     if (pending == 0) return true;
-    const std::size_t written = stream_->write_at(start_ + dirty_first_, buffer_.get() + dirty_first_, pending);
+    dirty_first_ +=
+        static_cast<int64_t>(stream_->write_at(start_ + dirty_first_, buffer_.get() + dirty_first_, pending));
+    if (dirty_first_ < dirty_last_) return false;
     dirty_first_ = dirty_last_ = 0;
-    return written == pending;
+    return true;
 }
 
 // Makes the buffer start at `start`, holding what the file has there.
 void BufferFile::loadWindow(int64_t start) {
     start_ = start;
+    dirty_first_ = dirty_last_ = 0;
     fill_ = static_cast<int64_t>(stream_->read_at(start, buffer_.get(), static_cast<std::size_t>(size_)));
     std::memset(buffer_.get() + fill_, 0, static_cast<std::size_t>(size_ - fill_));
 }
@@ -125,7 +137,7 @@ void BufferFile::moveTo(int64_t target) {
         cursor_ = target - start_;
         return;
     }
-    flush();
+    flush();  // what cannot be written is given up: the place asked for matters more to what follows
     const int64_t before = mode_ == READ ? keep_ : size_ / 2;
     loadWindow(std::max<int64_t>(target - before, 0));
     cursor_ = target - start_;
@@ -198,7 +210,10 @@ int64_t BufferFile::slideForWriting(const char* src, int64_t n) {
     if (!flush()) return 0;
     const int64_t half = size_ / 2, rest = n - fits, direct = std::max<int64_t>(rest - half, 0);
     const auto bytes = static_cast<std::size_t>(direct);
-    if (stream_->write_at(end, src + fits, bytes) != bytes) return fits;
+    if (const std::size_t moved = stream_->write_at(end, src + fits, bytes); moved != bytes) {
+        dropBuffer(end + static_cast<int64_t>(moved));
+        return fits + static_cast<int64_t>(moved);
+    }
     const int64_t tail = rest - direct;
     loadWindow(end + rest - half);
     std::memcpy(buffer_.get() + half - tail, src + n - tail, static_cast<std::size_t>(tail));
@@ -230,8 +245,7 @@ void BufferFile::readBlock(void* dst, int memory_type, int first_line, int lines
     const auto kernel = quo::find_kernel(quo::SampleAccess::kBlockRead, CellType, memory_type);
     if (samples == 0) samples = NrOfPixelsPerLine;
     const auto region = quo::region_of_samples(*this, first_line, lines, first_sample, samples);
-    if (!is_open() || !kernel || !region) return;
-    flush();
+    if (!is_open() || mode_ == WRITE || !kernel || !region || !flush()) return;
     const auto piece = samples * static_cast<int64_t>(quo::sample_size(memory_type));
     if (quo::read_region(*stream_, *region, {kernel, samples, piece, piece, ByteOrder == 1},
                          static_cast<char*>(dst)) == QUO_OK) {
@@ -243,17 +257,16 @@ void BufferFile::writeBlock(const void* src, int memory_type, int first_line, in
                             int samples) {
     const QuietErrno quiet;
     const auto kernel = quo::find_kernel(quo::SampleAccess::kBlockWrite, CellType, memory_type);
-    // Two doubles of a FLOAT64 file take one complex sample.
-    const int per_sample = memory_type == FLOAT_COMPLEX && CellType == FLOAT64 ? 2 : 1;
-    if (samples == 0) samples = NrOfPixelsPerLine / per_sample;
-    const auto region =
-        quo::region_of_samples(*this, first_line, lines, first_sample, int64_t{samples} * per_sample);
-    if (!is_writing() || !kernel || !region || samples < 0) return;
-    flush();
+    if (samples == 0) samples = NrOfPixelsPerLine;
+    auto region = quo::region_of_samples(*this, first_line, lines, first_sample, samples);
+    if (!is_writing() || !kernel || !region) return;
+    const int64_t before = RowPrefix + int64_t{first_sample} * element_sizeof();
+    if (memory_type == FLOAT_COMPLEX && CellType == FLOAT64 && !make_room_for_pairs(*region, before)) return;
+    if (!flush()) return;
     const auto piece = samples * static_cast<int64_t>(quo::sample_size(memory_type));
     quo::write_region(*stream_, *region, {kernel, samples, piece, piece, ByteOrder == 1},
                       static_cast<const char*>(src));
-    dropBuffer(quo::line_after(*this, first_line, lines));
+    dropBuffer(region->first - before + region->count * region->distance);
 }
 
 void BufferFile::readbuffer(float* dst, int line, int lines, int sample, int samples) {
@@ -296,14 +309,13 @@ void BufferFile::writebuffer(const dcomplex* src, int line, int lines, int sampl
 bool BufferFile::prefixRegion(int first_line, int lines, quo::RasterRegion& region) const {
     const auto found = quo::region_of_prefixes(*this, first_line, lines);
     if (found) region = *found;
-    return is_open() && found.has_value();
+    return found.has_value();
 }
 
 void BufferFile::readprefix(char* dst, int first_line, int lines) {
     const QuietErrno quiet;
     quo::RasterRegion region;
-    if (!prefixRegion(first_line, lines, region)) return;
-    flush();
+    if (!is_open() || mode_ == WRITE || !prefixRegion(first_line, lines, region) || !flush()) return;
     if (quo::read_region(*stream_, region, {nullptr, 0, region.piece, region.piece, false}, dst) == QUO_OK) {
         dropBuffer(quo::line_after(*this, first_line, lines));
     }
@@ -312,17 +324,15 @@ void BufferFile::readprefix(char* dst, int first_line, int lines) {
 void BufferFile::writeprefix(const char* src, int first_line, int lines) {
     const QuietErrno quiet;
     quo::RasterRegion region;
-    if (!is_writing() || !prefixRegion(first_line, lines, region)) return;
-    flush();
+    if (!is_writing() || !prefixRegion(first_line, lines, region) || !flush()) return;
     quo::write_region(*stream_, region, {nullptr, 0, region.piece, region.piece, false}, src);
     dropBuffer(quo::line_after(*this, first_line, lines));
 }
 
 void BufferFile::writeOffset(const char* src, int n) {
     const QuietErrno quiet;
-    if (!is_writing() || n < 1 || HeaderOffset < 1) return;
+    if (!is_writing() || n < 1 || HeaderOffset < 1 || !flush()) return;
     const int64_t back = place();
-    flush();
     stream_->write_at(0, src, static_cast<std::size_t>(std::min<int64_t>(n, HeaderOffset)));
     if (buffer_) loadWindow(start_);
     moveTo(back);

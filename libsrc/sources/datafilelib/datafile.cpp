@@ -163,6 +163,7 @@ int DataFile::open(int mode) {
     state_ = kModes[mode].state;
     position_ = 0;
     cursor_ = fill_ = 0;
+    pending_ = false;
     if (BufferSize > 0) {
         buffer_.reset(new (std::nothrow) char[static_cast<std::size_t>(BufferSize)]);
         if (!buffer_) {
@@ -182,32 +183,34 @@ int DataFile::close() {
     BufferSize = 0;
     position_ = 0;
     cursor_ = fill_ = 0;
+    pending_ = false;
     if (!stream_->close()) return frame.fail(QUO_WRITE_FAILED, kWriteFailed);
     return frame.success();
 }
 
-// Writes the pending bytes where the stream stands; the position moves past them.
+// Writes what is pending up to the cursor; the emptied buffer then starts at the cursor's place. After a failure
+// all of it is still pending.
 int DataFile::flushBuffer() {
     const auto pending = static_cast<std::size_t>(cursor_);
-    if (stream_->write(buffer_.get(), pending) != pending) return QUO_WRITE_FAILED;
-    cursor_ = 0;
+    if (pending_ && stream_->write_at(position_, buffer_.get(), pending) != pending) return QUO_WRITE_FAILED;
+    pending_ = false;
+    position_ += cursor_;
+    cursor_ = fill_ = 0;
     return QUO_OK;
 }
 
 int DataFile::refill() {
-    stream_->seek(position_);
-    fill_ = static_cast<std::int32_t>(stream_->read(buffer_.get(), static_cast<std::size_t>(BufferSize)));
+    fill_ = static_cast<std::int32_t>(
+        stream_->read_at(position_, buffer_.get(), static_cast<std::size_t>(BufferSize)));
     cursor_ = 0;
     return fill_;
 }
 
 int DataFile::seekWriting(int64_t offset) {
+    const auto target = (quo::Checked<std::int64_t>{position_} + offset).value();  // from the buffer's start
     if (flushBuffer() != QUO_OK) return QUO_WRITE_FAILED;
-    const auto target = (quo::Checked<std::int64_t>{position_} + offset).value();
     if (!target || *target < 0) return QUO_REFUSED;
     position_ = *target;
-    fill_ = 0;
-    stream_->seek(position_);
     return QUO_OK;
 }
 
@@ -239,14 +242,13 @@ int DataFile::seek(int64_t offset, int whence) {
     const auto target = (quo::Checked<std::int64_t>{whence == 0 ? 0 : position_} + offset).value();
     if (!target || *target < 0) return frame.fail(QUO_REFUSED, "A place before the start of the file");
     position_ = *target;
-    stream_->seek(position_);
     return frame.success();
 }
 
 int DataFile::readBuffered(char* dst, int64_t n) {
     while (n > 0) {
         if (cursor_ >= fill_) {
-            position_ += fill_;
+            if (flushBuffer() != QUO_OK) return QUO_WRITE_FAILED;
             if (refill() == 0) return QUO_READ_FAILED;
         }
         const int64_t part = std::min<int64_t>(n, fill_ - cursor_);
@@ -262,8 +264,7 @@ int DataFile::read(char* dst, int64_t n) {
     quo::CallFrame frame{"DataFile::read", kSource};
     if (!is_open() || state_ == 1 || n < 0) return frame.fail(QUO_REFUSED, "The file is not open for reading");
     if (buffer_) return finish(frame, readBuffered(dst, n));
-    if (stream_->read(dst, static_cast<std::size_t>(n)) != static_cast<std::size_t>(n)) {
-        stream_->seek(position_);
+    if (stream_->read_at(position_, dst, static_cast<std::size_t>(n)) != static_cast<std::size_t>(n)) {
         return frame.fail(QUO_READ_FAILED, kReadFailed);
     }
     position_ += n;
@@ -274,12 +275,16 @@ int DataFile::writeBuffered(const char* src, int64_t n) {
     if (n < BufferSize - cursor_) {
         std::memcpy(buffer_.get() + cursor_, src, static_cast<std::size_t>(n));
         cursor_ += static_cast<std::int32_t>(n);
+        pending_ = true;
         return QUO_OK;
     }
-    const int32_t pending = cursor_;
     if (flushBuffer() != QUO_OK) return QUO_WRITE_FAILED;
-    position_ += pending;
-    if (stream_->write(src, static_cast<std::size_t>(n)) != static_cast<std::size_t>(n)) return QUO_WRITE_FAILED;
+    return writeDirectly(src, n);
+}
+
+int DataFile::writeDirectly(const char* src, int64_t n) {
+    const auto bytes = static_cast<std::size_t>(n);
+    if (stream_->write_at(position_, src, bytes) != bytes) return QUO_WRITE_FAILED;
     position_ += n;
     return QUO_OK;
 }
@@ -287,12 +292,7 @@ int DataFile::writeBuffered(const char* src, int64_t n) {
 int DataFile::write(const char* src, int64_t n) {
     quo::CallFrame frame{"DataFile::write", kSource};
     if (!is_open() || state_ == 0 || n < 0) return frame.fail(QUO_REFUSED, "The file is not open for writing");
-    if (buffer_) return finish(frame, writeBuffered(src, n));
-    if (stream_->write(src, static_cast<std::size_t>(n)) != static_cast<std::size_t>(n)) {
-        return frame.fail(QUO_WRITE_FAILED, kWriteFailed);
-    }
-    position_ += n;
-    return frame.success();
+    return finish(frame, buffer_ ? writeBuffered(src, n) : writeDirectly(src, n));
 }
 
 int64_t DataFile::tell() const { return buffer_ ? position_ + cursor_ : position_; }
@@ -359,7 +359,6 @@ int DataFile::prepareRegion(int64_t next) {
     if (buffer_ && state_ != 0 && flushBuffer() != QUO_OK) return QUO_WRITE_FAILED;
     position_ = next;
     cursor_ = fill_ = 0;
-    stream_->seek(next);
     return QUO_OK;
 }
 
@@ -410,12 +409,16 @@ int BufferIO::readbuffer(char* dst, int width) {
         return finish(frame, status);
 
     const auto kernel = quo::find_kernel(quo::SampleAccess::kRegionRead, File->CellType, MemoryType);
-    if (!kernel) return frame.success();  // deliberate: a pair without a conversion is no failure
+    if (!kernel) {  // deliberate: a pair without a conversion is no failure, a region beyond the file is
+        return finish(frame, File->stream_->length().value_or(0) < region->end() ? QUO_READ_FAILED : QUO_OK);
+    }
     const auto size = static_cast<std::int64_t>(quo::sample_size(MemoryType));
     return finish(frame,
                   quo::read_region(*File->stream_, *region,
                                    {kernel, Samples, Samples * size, width * size, File->ByteOrder == 1}, dst));
 }
+
+int BufferIO::writebuffer(const char* src) { return writebuffer(src, Samples); }
 
 int BufferIO::writebuffer(const char* src, int width) {
     quo::CallFrame frame{"BufferIO::writebuffer", kSource};

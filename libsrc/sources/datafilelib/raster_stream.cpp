@@ -56,7 +56,6 @@ bool RasterStream::open(const char* path, Mode mode) noexcept {
         return false;
     }
     descriptor_ = descriptor;
-    place_ = 0;
     return true;
 }
 
@@ -64,7 +63,6 @@ bool RasterStream::close() noexcept {
     if (descriptor_ < 0) return true;
     const bool closed = ::close(descriptor_) == 0;
     descriptor_ = -1;
-    place_ = 0;
     return closed;
 }
 
@@ -87,18 +85,6 @@ std::size_t RasterStream::write_at(std::int64_t offset, const void* from, std::s
         return pwrite(descriptor_, static_cast<const char*>(from) + done, left,
                       offset + static_cast<std::int64_t>(done));
     });
-}
-
-std::size_t RasterStream::read(void* to, std::size_t size) noexcept {
-    const std::size_t moved = read_at(place_, to, size);
-    place_ += static_cast<std::int64_t>(moved);
-    return moved;
-}
-
-std::size_t RasterStream::write(const void* from, std::size_t size) noexcept {
-    const std::size_t moved = write_at(place_, from, size);
-    place_ += static_cast<std::int64_t>(moved);
-    return moved;
 }
 
 bool raster_exists(const char* path) noexcept {

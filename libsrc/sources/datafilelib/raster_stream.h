@@ -7,8 +7,7 @@
 
 namespace quo {
 
-/** An open raster file: whole transfers at 64-bit positions, and a place of its own for those that follow each
- * other. Folders are refused. */
+/** An open raster file: whole transfers at 64-bit positions. Folders are refused. */
 class RasterStream {
 public:
     enum class Mode : std::uint8_t { kRead, kCreate, kCreateAndRead, kUpdate };
@@ -29,16 +28,8 @@ public:
     std::size_t read_at(std::int64_t offset, void* to, std::size_t size) const noexcept;
     std::size_t write_at(std::int64_t offset, const void* from, std::size_t size) const noexcept;
 
-    /** @name Transfers from place to place
-     * @{ */
-    std::size_t read(void* to, std::size_t size) noexcept;
-    std::size_t write(const void* from, std::size_t size) noexcept;
-    void seek(std::int64_t offset) noexcept { place_ = offset; }
-    /** @} */
-
 private:
     int descriptor_ = -1;
-    std::int64_t place_ = 0;
 };
 
 /** Whether a raster can be opened for reading. */
