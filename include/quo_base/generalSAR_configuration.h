@@ -1,6 +1,12 @@
 #ifndef QUO_BASE_GENERALSAR_CONFIGURATION_H
 #define QUO_BASE_GENERALSAR_CONFIGURATION_H
 
+#include <memory>
+#include <span>
+#include <string>
+#include <string_view>
+#include <vector>
+
 #include "quo_base/api.h"
 #include "quo_base/quorelReport.h"
 #include "quo_base/quorelxml_v2.h"
@@ -19,21 +25,30 @@ class GeneralSAR;
 /** The parameters that all processors share. Values missing in a file stay as they are. */
 class QUO_BASE_API GeneralSAR_BaseConfiguration {
 public:
+    static constexpr int kSharedParameters = 5;
+
     GeneralSAR_BaseConfiguration() = default;
-    virtual ~GeneralSAR_BaseConfiguration();
 
     virtual int readpar(const char* file, int channel);         ///< does nothing here, 0
     virtual int writepar(const char* file, int channel);        ///< does nothing here, 0
-    virtual int clone(GeneralSAR_BaseConfiguration* to) const;  ///< copies the shared parameters, 0
+    virtual int clone(GeneralSAR_BaseConfiguration* to) const;  ///< copies the shared parameters; 0, 1 for null
+    virtual ~GeneralSAR_BaseConfiguration();
 
     /** Reads the shared parameters from a section of a file; missing ones stay as they are. Returns 0. */
     int readConf(const char* file, int channel, const char* section);
     /** Deliberate: the shared parameters are input only, so nothing is written. Returns 0. */
     int writeConf(const char* file, int channel, const char* section);
 
+    /** A shared parameter by its index, described like an element of a header object; it points into this object.
+     * Without name and values beyond the last. */
+    [[nodiscard]] parElement sharedParameter(int index);
+    /** Its unit, empty where it has none, and what it means. */
+    [[nodiscard]] static const char* sharedUnit(int index);
+    [[nodiscard]] static const char* sharedMeaning(int index);
+
     int32_t Memory = 512;                           ///< working memory that a processor may take, MB
     int32_t Incore = 0;                             ///< 1 keeps intermediate results in memory
-    int32_t Verbose = 0;                            ///< 1 prints progress in detail
+    int32_t Verbose = 0;                            ///< above 0 prints progress in detail
     int32_t ReportLevel = 1;                        ///< level of the report, 1 to 3; 0 none
     char ReportFilename[512] = "quorelReport.txt";  ///< name of the report file
 };
@@ -56,6 +71,11 @@ public:
     int writepar(const char* file, int channel) override;
     /** Copies every parameter, the shared ones too, into a record of the same class. 0; 1 for one of another. */
     int clone(GeneralSAR_BaseConfiguration* to) const override;
+
+    /** Names of all record classes, which are their sections. */
+    [[nodiscard]] static std::span<const char* const> names();
+    /** A new record with its defaults, by its name; null for any other name. */
+    [[nodiscard]] static std::unique_ptr<GeneralSAR_ConfigurationRecord> make(std::string_view name);
 
     /** The record's section: its class name. */
     [[nodiscard]] const char* section() const { return section_; }
@@ -138,8 +158,8 @@ class QUO_BASE_API EnvisatCalibrationFactors : public GeneralSAR_ConfigurationRe
      * WSML_HH or WSML_VV, or, with one range look, WSS_HH or WSS_VV, by polarisation.
      * @return 0; 1 for a null product, another sensor, or any other combination, with the factor unchanged. */
     int writeFactor(GeneralSAR* product) const;
-    /** The same on a header file: read, set, written back. 0, or 1 also when the file cannot be read; it is then
-     * not written. */
+    /** The same on a header file: read, set, written back. 0, or 1 also when the file cannot be read or saved; the
+     * old file is then whole. */
     int writeFactor(const char* header_file) const;
 
     double IM_HH[7] = {1, 1, 1, 1, 1, 1, 1}, IM_VV[7] = {1, 1, 1, 1, 1, 1, 1};
@@ -238,5 +258,27 @@ private:
     GeneralSAR_BaseConfiguration* table_[kSelectors];
     bool enabled_[kSelectors] = {};
 };
+
+/** Something in a configuration file that does not fit its record. */
+struct ConfigurationFinding {
+    std::string section, name;  ///< the name is empty where the whole section is meant
+    std::string reason;         ///< continues the name: "is missing", "17 lies above 1"
+};
+
+/** What a configuration file holds. */
+struct ConfigurationReview {
+    std::vector<std::string> records;  ///< the records that are there, by name, in the order of the file
+    std::vector<ConfigurationFinding> findings;
+};
+
+/** Compares a channel of a configuration file with the records that it holds. Findings are sections and elements
+ * that no record knows or that stand there more than once, mandatory elements that are missing, wrong counts of
+ * values, texts that do not fit or are no numbers, and numbers outside their bounds; reading a record would notice
+ * only what is missing. A section "generalProcessingConf" with nothing but shared parameters is not the record of
+ * that name.
+ *
+ * @param[out] review  replaced, also on failure
+ * @return 0, with or without findings; 1 when the file is missing or no header document; 7. */
+QUO_BASE_API int reviewConfiguration(const char* file, int channel, ConfigurationReview& review);
 
 #endif

@@ -1,13 +1,17 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include <map>
+#include <cstring>
+#include <filesystem>
+#include <sstream>
 #include <string>
+#include <typeinfo>
 #include <vector>
 
 #include "quo_base/generalSAR_configuration.h"
 #include "support/diagnostics.h"
 #include "support/fields.h"
+#include "support/full_disk.h"
 
 namespace {
 
@@ -16,36 +20,83 @@ using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::Not;
 
-// What a record holds, by class: the number of elements and the bounds and defaults that are fixed.
-struct Promise {
-    const char* element;
-    double minimum, maximum, value;
-};
+// What a record must hold, by class: its elements in order as "name type", with the bounds of ints ("int" alone:
+// from 0), and the defaults where they are fixed.
 template <typename T>
-struct Expected;
-#define QUO_EXPECTED(Class, size, ...)                                   \
-    template <>                                                          \
-    struct Expected<Class> {                                             \
-        static constexpr const char* kName = #Class;                     \
-        static constexpr int kSize = size;                               \
-        static std::vector<Promise> promises() { return {__VA_ARGS__}; } \
-    };
-constexpr double kMaxInt = 2147483647.0;
-QUO_EXPECTED(AzimuthConf, 16, {"WhiteningFlag", 0, 1, 0}, {"LinesInBlock", 0, kMaxInt, 5000},
-             {"SamplesInBlock", 0, kMaxInt, 256}, {"AzimuthOverlap", 0, kMaxInt, 2500},
-             {"RangeOverlap", 0, kMaxInt, 20}, {"PerformInterpolation", 0, kMaxInt, 7}, {"ApplyRgShift", 0, 0, 0},
-             {"ApplyAzShift", 0, 0, 0})
-QUO_EXPECTED(DCestConf, 27, {"Dswst", 0, 1, 1}, {"Pol_weights", 0, 1, 1}, {"Amb_flag", 0, kMaxInt, 1})
-QUO_EXPECTED(ExtractorConf, 2, {"RawLinesSkip", 0, kMaxInt, 0}, {"RawLinesToExtract", 0, kMaxInt, 0})
-QUO_EXPECTED(generalProcessingConf, 11, {"Flag_incore", 0, 1, 0}, {"EraseTemp", 0, 1, 1})
-QUO_EXPECTED(FinefitestConf, 4, {"RangeMaxShift", 0, kMaxInt, 8}, {"AzimuthBlockSize", 0, kMaxInt, 128})
-QUO_EXPECTED(EnvisatCalibrationFactors, 10, {"IM_HH", 0, 0, 1}, {"WSS_VV", 0, 0, 1})
-QUO_EXPECTED(DemExtractorConf, 7, {"LatitudeMarginPerc", 0, 100, 10}, {"InterpolationFlag", 0, 1, 1})
-QUO_EXPECTED(GeocodingConf, 3, {"InterpolationPrecision", 1, 5, 2}, {"InterpolationFilterLength", 3, kMaxInt, 11})
-QUO_EXPECTED(ATPrecise_FitestConf, 4, {"CoarseValidBlocks", 0, kMaxInt, 10})
-QUO_EXPECTED(CoregistrationConf, 4, {"InterpolationPrecision", 1, 5, 3}, {"DCDemodulationType", 0, 1, 1})
-QUO_EXPECTED(CoherenceConf, 19, {"EFFlag", 0, 1, 1}, {"AzimuthPresumSamples", 0, kMaxInt, 5})
-#undef QUO_EXPECTED
+struct Promise {
+    static const char *const kName, *const kElements, *const kDefaults;
+};
+#define QUO_PROMISE(Class, elements, defaults)              \
+    template <>                                             \
+    const char* const Promise<Class>::kName = #Class;       \
+    template <>                                             \
+    const char* const Promise<Class>::kElements = elements; \
+    template <>                                             \
+    const char* const Promise<Class>::kDefaults = defaults;
+QUO_PROMISE(AzimuthConf,
+            "WhiteningFlag int:0:1, AntennaLength float, AzimuthWindowHammingParameter float, "
+            "AzimuthLookBandwidth float, AzimuthTransitionBandwidth float, RangeWindowHammingParameter float, "
+            "RangeLookBandwidth float, RangeTransitionBandwidth float, LinesInBlock int, SamplesInBlock int, "
+            "AzimuthOverlap int, RangeOverlap int, PerformInterpolation int, StoltPadding float, "
+            "ApplyRgShift int:0:0, ApplyAzShift int:0:0",
+            "0 10 0 0 0 0 0 0 5000 256 2500 20 7 0.4 0 0")
+QUO_PROMISE(DCestConf,
+            "Nbestblocks int, Nummlbf int, Nwdarbloks int, Blocks int, Blockl int, Dswst int:0:1, Patchs int, "
+            "Patchl int, RgBand float, AnLen float, Lookbf float, Lookbt float, Lookrp float, Lookrs float, "
+            "Decfac int, Flength int, Dftstep float, Fftrgprc float, Fftazprc float, Peakwid float, Minamb float, "
+            "Maxamb float, Kthr float, Sthr float, Varth float, Amb_flag int, Pol_weights int:0:1 x 7",
+            nullptr)
+QUO_PROMISE(ExtractorConf, "RawLinesSkip int, RawLinesToExtract int", "0 0")
+QUO_PROMISE(generalProcessingConf,
+            "Flag_incore int:0:1, Flag_ortog int:0:1, Flag_swstal int:0:1, Flag_ext int:0:1, "
+            "Flag_rangefoc int:0:1, Flag_rgpatt int:0:1, Flag_azimuthfoc int:0:1, Flag_dcest int:0:1, "
+            "Remove_interferences int:0:1, Azblk int:0:1, EraseTemp int:0:1",
+            nullptr)
+QUO_PROMISE(FinefitestConf, "RangeMaxShift int, AzimuthMaxShift int, RangeBlockSize int, AzimuthBlockSize int",
+            "8 128 128 128")
+QUO_PROMISE(EnvisatCalibrationFactors,
+            "IM_HH double x 7, IM_VV double x 7, AP_HH double x 7, AP_HV double x 7, AP_VH double x 7, "
+            "AP_VV double x 7, WSML_HH double, WSML_VV double, WSS_HH double, WSS_VV double",
+            nullptr)
+QUO_PROMISE(DemExtractorConf,
+            "LatitudeOversampling int, LongitudeOversampling int, LatitudeMarginPerc int:0:100, "
+            "LongitudeMarginPerc int:0:100, InterpolationFlag int:0:1, GeoidCorrectionFilename text, "
+            "SRTMDirectory text",
+            nullptr)
+QUO_PROMISE(GeocodingConf,
+            "InterpolationPrecision int:1:5, InterpolationFilterLength int:3:2147483647, "
+            "InterpolationFilterBandwidth float",
+            "2 11 0.8")
+QUO_PROMISE(ATPrecise_FitestConf,
+            "RangeMinOverlap int, AzimuthMinOverlap int, CoarseValidBlocks int, FineValidBlocks int", nullptr)
+QUO_PROMISE(CoregistrationConf,
+            "InterpolationPrecision int:1:5, InterpolationFilterLength int:3:2147483647, "
+            "InterpolationFilterBandwidth float, DCDemodulationType int:0:1",
+            nullptr)
+QUO_PROMISE(CoherenceConf,
+            "RangeEstimatesFrequencies int, AzimuthEstimatesFrequencies int, MaxBias float, "
+            "MinimumNumberOfLooks float, CoherenceRangeSemiAperture int, CoherenceAzimuthSemiAperture int, "
+            "APrioriRangeSemiAperture int, APrioriAzimuthSemiAperture int, RangeSemiAperture4Frequency int, "
+            "AzimuthSemiAperture4Frequency int, ConfidenceLevel float, SaturationLevel float, "
+            "AzimuthPresumSamples int, BiasMapFlag int:0:1, APrioriCoherenceFlag int:0:1, EFFlag int:0:1, "
+            "DespeckleFlag int:0:1, ENLAzimuthAperture int, ENLRangeAperture int",
+            nullptr)
+#undef QUO_PROMISE
+
+std::string described(const parElement& element) {
+    constexpr const char* kTypes[] = {"double", "float", "int", "text", "none"};
+    std::string text = element.name + std::string{" "} + kTypes[element.type];
+    if (element.type == parElement::typeInt && (element.minimum != 0 || element.maximum != 2147483647.0))
+        text += ":" + test::digits(element.minimum) + ":" + test::digits(element.maximum);
+    return element.count == 1 ? text : text + " x " + std::to_string(element.count);
+}
+
+std::string first_value(const parElement& element) {
+    if (element.type != parElement::typeFloat) return test::values_of(element)[0];
+    std::ostringstream text;  // with the digits that a float has
+    text << *static_cast<const float*>(element.pointer);
+    return text.str();
+}
 
 template <typename T>
 class Records : public testing::Test {
@@ -68,23 +119,24 @@ using AllRecords = testing::Types<AzimuthConf, DCestConf, ExtractorConf, general
                                   CoregistrationConf, CoherenceConf>;
 TYPED_TEST_SUITE(Records, AllRecords);
 
-TYPED_TEST(Records, HoldTheirElements) {
+TYPED_TEST(Records, HoldTheirElementsInOrder) {
     const TypeParam record;
-    EXPECT_STREQ(record.section(), Expected<TypeParam>::kName);
-    ASSERT_EQ(record.elementCount(), Expected<TypeParam>::kSize);
-    std::map<std::string, const parElement*> elements;
+    std::string elements, defaults;
     for (int i = 0; i < record.elementCount(); ++i) {
-        EXPECT_TRUE(record.element(i)->mandatory) << record.element(i)->name;
-        EXPECT_STRNE(record.meaning(i), "") << record.element(i)->name;
-        elements[record.element(i)->name] = record.element(i);
+        const parElement& element = *record.element(i);
+        EXPECT_TRUE(element.mandatory) << element.name;
+        EXPECT_STRNE(record.meaning(i), "") << element.name;
+        elements += (i > 0 ? ", " : "") + described(element);
+        defaults += (i > 0 ? " " : "") + first_value(element);
     }
-    for (const Promise& promise : Expected<TypeParam>::promises()) {
-        ASSERT_TRUE(elements.contains(promise.element)) << promise.element;
-        const parElement& element = *elements[promise.element];
-        EXPECT_EQ(element.minimum, promise.minimum) << promise.element;
-        EXPECT_EQ(element.maximum, promise.maximum) << promise.element;
-        EXPECT_EQ(test::values_of(element)[0], test::digits(promise.value)) << promise.element;
+    EXPECT_EQ(elements, Promise<TypeParam>::kElements);
+    if (Promise<TypeParam>::kDefaults) {
+        EXPECT_EQ(defaults, Promise<TypeParam>::kDefaults);
     }
+    EXPECT_STREQ(record.section(), Promise<TypeParam>::kName);
+    const auto made = GeneralSAR_ConfigurationRecord::make(record.section());
+    ASSERT_TRUE(made);
+    EXPECT_EQ(typeid(*made), typeid(record));
     EXPECT_STREQ(record.meaning(-1), "");
     EXPECT_STREQ(record.unit(1000), "");
 }
@@ -115,6 +167,8 @@ TYPED_TEST(Records, ComeBackFromAFileAndFromAClone) {
     EXPECT_EQ(cloned.Memory, 1234);
     GeneralSAR_BaseConfiguration plain;
     EXPECT_EQ(written.clone(&plain), 1);
+    EXPECT_EQ(written.clone(nullptr), 1);
+    EXPECT_EQ(plain.clone(nullptr), 1);
     EXPECT_TRUE(this->report_.entries("ERROR").empty());
 }
 
@@ -137,9 +191,20 @@ TYPED_TEST(Records, ThrowForEachMissingElement) {
 TYPED_TEST(Records, ThrowWhenTheyCannotBeWrittenAndKeepTheOldFile) {
     const test::CapturedStderr silent;
     TypeParam record;
-    EXPECT_EQ(this->thrown([&] { record.writepar("/dev/full", 1); }), "Cannot write specific configuration file");
     EXPECT_EQ(this->thrown([&] { record.writepar(this->report_.file("missing/c.xml").c_str(), 1); }),
               "Cannot write specific configuration file");
+    record.writepar(this->file_.c_str(), 1);
+    const std::string old = test::read_text(this->file_);
+    test::fill_fields(record);
+    std::string failure;
+    for (const std::size_t room : {std::size_t{0}, old.size() / 2}) {
+        {
+            const test::FullDisk full{room};
+            failure = this->thrown([&] { record.writepar(this->file_.c_str(), 1); });
+        }
+        EXPECT_EQ(failure, "Cannot write specific configuration file");
+        EXPECT_EQ(test::read_text(this->file_), old);
+    }
 }
 
 class Configuration : public testing::Test {
@@ -210,12 +275,15 @@ TEST_F(Configuration, ContainerReadsAllOrThrowsAtTheFirst) {
     EXPECT_THROW(partial.GSread(file_.c_str(), 1), quorelException);
     EXPECT_TRUE(partial.GSexists(gscAzimuthConf));
     EXPECT_TRUE(partial.GSexists(gscDCestConf));
+    EXPECT_TRUE(partial.GSexists(gscExtractorConf)) << "set before it was read";
     EXPECT_FALSE(partial.GSexists(gscGeneralProcessingConf));
 
     const test::CapturedStderr silent;
     const std::string missing = report_.file("missing.xml");
     EXPECT_EQ(partial.GSread(missing.c_str(), 1), 1);
     EXPECT_THAT(report_.messages("ERROR"), ElementsAre("File : " + missing + " DOES NOT EXIST!"));
+    EXPECT_EQ(partial.GSread(nullptr, 1), 1);
+    EXPECT_EQ(partial.GSclone(nullptr), 1);
 }
 
 TEST_F(Configuration, GeneralRecordReadsAtConstruction) {
@@ -224,6 +292,153 @@ TEST_F(Configuration, GeneralRecordReadsAtConstruction) {
     written.writepar(file_.c_str(), 1);
     EXPECT_EQ(generalProcessingConf(file_.c_str(), 1).Flag_rgpatt, 0);
     EXPECT_THROW(generalProcessingConf(report_.file("missing.xml").c_str(), 1), quorelException);
+}
+
+// --- files that mean no good ------------------------------------------------------------------------------------
+
+/** A valid file of two records with one place changed. */
+struct Damage {
+    const char* name;
+    std::string from, to;
+    std::vector<std::string> findings;
+    bool readable = true;  // whether both records can still be read
+};
+void PrintTo(const Damage& row, std::ostream* stream) { *stream << row.name; }
+
+class DamagedConfiguration : public testing::TestWithParam<Damage> {
+protected:
+    static std::string good(const test::Report& report) {
+        const std::string file = report.file("good.xml");
+        DCestConf{}.writepar(file.c_str(), 1);
+        DemExtractorConf{}.writepar(file.c_str(), 1);
+        return test::read_text(file);
+    }
+    test::Report report_;
+};
+
+std::string values(int count) {
+    std::string text = "<Pol_weights>";
+    for (int i = 0; i < count; ++i) text += "<val>1</val>";
+    return text + "</Pol_weights>";
+}
+constexpr const char* kDoctype = "<!DOCTYPE QuorelXmlDoc [<!ENTITY a \"ha\"><!ENTITY b \"&a;&a;&a;&a;\">]>";
+
+const Damage kDamages[] = {
+    {"Nothing", "", "", {}},
+    {"UnknownElement", "<Blocks>", "<Bolcks>7</Bolcks><Blocks>", {"DCestConf/Bolcks is unknown"}},
+    {"ElementOfAnotherNamespace",
+     "<Blocks>20</Blocks>",
+     "<x:Blocks xmlns:x='urn:x'>20</x:Blocks>",
+     {"DCestConf/Blocks is unknown", "DCestConf/Blocks is missing"},
+     false},
+    {"ElementTwice", "<Blocks>", "<Blocks>7</Blocks><Blocks>", {"DCestConf/Blocks stands there more than once"}},
+    {"Missing", "<Blocks>20</Blocks>", "", {"DCestConf/Blocks is missing"}, false},
+    {"UnknownSection", "<DCestConf>", "<DcConf/><DCestConf>", {"DcConf/ is no configuration record"}},
+    {"SectionTwice",
+     "<DCestConf>",
+     "<DemExtractorConf/><DCestConf>",
+     {"DemExtractorConf/LatitudeOversampling is missing", "DemExtractorConf/ stands there more than once"}},
+    {"AboveItsBounds", "<Dswst>1<", "<Dswst>2<", {"DCestConf/Dswst 2 lies above 1"}},
+    {"BelowItsBounds", "<Lookbf>0.8", "<Lookbf>-0.8", {"DCestConf/Lookbf -0.8"}},
+    {"BeyondAnInt", "<Blocks>20<", "<Blocks>99999999999<", {"DCestConf/Blocks 99999999999 lies above 2147483647"}},
+    {"Words", "<Blocks>20<", "<Blocks>twenty<", {"DCestConf/Blocks \"twenty\" is no whole number"}},
+    {"HalfANumber", "<Blocks>20<", "<Blocks>20.5<", {"DCestConf/Blocks \"20.5\" is no whole number"}},
+    {"NoNumber", "<Kthr>3<", "<Kthr><", {"DCestConf/Kthr \"\" is no number"}},
+    {"NotFinite", "<Kthr>3<", "<Kthr>nan<", {"DCestConf/Kthr \"nan\" is not finite"}},
+    {"TooFewValues", "Pol_weights", values(5), {"DCestConf/Pol_weights has 5 values, not 7"}},
+    {"TooManyValues", "Pol_weights", values(70000), {"DCestConf/Pol_weights has 70000 values, not 7"}},
+    {"ListOfValues",
+     "Pol_weights",
+     "<Pol_weights>1, 0, 0, 1, 3, 0, 0</Pol_weights>",
+     {"DCestConf/Pol_weights 3 lies above 1"}},
+    {"LongText",
+     "<SRTMDirectory>NOT_AVAILABLE",
+     "<SRTMDirectory>" + std::string(600, 'd'),
+     {"DemExtractorConf/SRTMDirectory has 600 bytes, more than 511"}},
+};
+
+TEST_P(DamagedConfiguration, IsReviewedAndReadWithoutLoss) {
+    const auto& [name, from, to, findings, readable] = GetParam();
+    std::string text = good(report_);
+    const std::string place = from == "Pol_weights" ? test::element_text(text, from) : from;
+    ASSERT_NE(text.find(place), text.npos);
+    text.replace(text.find(place), place.size(), to);
+    const std::string file = report_.file("damaged.xml");
+    test::write_text(file, text);
+
+    ConfigurationReview review;
+    ASSERT_EQ(reviewConfiguration(file.c_str(), 1, review), 0);
+    std::size_t matched = 0;
+    for (const auto& finding : review.findings) {
+        const std::string line = finding.section + "/" + finding.name + " " + finding.reason;
+        for (const std::string& expected : findings) matched += line.starts_with(expected) ? 1U : 0U;
+    }
+    EXPECT_EQ(matched, findings.size());
+    if (name != std::string{"SectionTwice"}) {
+        EXPECT_EQ(review.findings.size(), findings.size());
+    }
+    EXPECT_THAT(review.records, testing::UnorderedElementsAre("DCestConf", "DemExtractorConf"));
+
+    DCestConf doppler;
+    DemExtractorConf dem;
+    const auto read = [&] { doppler.readpar(file.c_str(), 1), dem.readpar(file.c_str(), 1); };
+    if (readable) {
+        EXPECT_NO_THROW(read());
+        EXPECT_LT(std::strlen(dem.SRTMDirectory), sizeof dem.SRTMDirectory);
+    } else {
+        EXPECT_THROW(read(), quorelException);
+    }
+}
+INSTANTIATE_TEST_SUITE_P(Files, DamagedConfiguration, testing::ValuesIn(kDamages),
+                         [](const auto& row) { return row.param.name; });
+
+// What is no header at all: the review refuses it, records throw and keep every value, and nothing is written.
+TEST_F(DamagedConfiguration, ThatIsNoDocumentIsRefused) {
+    const std::string text = good(report_), file = report_.file("hostile.xml"), folder = report_.file("folder");
+    std::string laughs = text;
+    laughs.insert(laughs.find("<QuorelXmlDoc>"), kDoctype);
+    laughs.replace(laughs.find("<Blocks>20"), 10, "<Blocks>&b;");
+    std::filesystem::create_directory(folder);
+    std::vector<std::string> contents{"", "[DCestConf]\nBlocks = 7\n", std::string(5000, '\0'), laughs,
+                                      text + text};
+    for (std::size_t length = 40; length < text.size() - 20; length += 97)
+        contents.push_back(text.substr(0, length));
+    ConfigurationReview review;
+    for (const std::string& content : contents) {
+        test::write_text(file, content);
+        EXPECT_EQ(reviewConfiguration(file.c_str(), 1, review), 1);
+        DCestConf record, fresh;
+        EXPECT_THROW(record.readpar(file.c_str(), 1), quorelException);
+        EXPECT_THAT(test::differing_fields(record, fresh), IsEmpty());
+        EXPECT_EQ(test::read_text(file), content);
+    }
+    GeneralSAR_configuration container;
+    EXPECT_THROW(container.GSread(folder.c_str(), 1), quorelException);
+    EXPECT_EQ(reviewConfiguration(folder.c_str(), 1, review), 1);
+    EXPECT_EQ(reviewConfiguration(report_.file("missing.xml").c_str(), 1, review), 1);
+    EXPECT_EQ(reviewConfiguration(nullptr, 1, review), 1);
+    EXPECT_THROW(DCestConf{}.readpar(nullptr, 1), quorelException);
+    EXPECT_THROW(DCestConf{}.writepar(nullptr, 1), quorelException);
+}
+
+// The section of the shared parameters is the record of that name only where it holds an element of it.
+TEST_F(DamagedConfiguration, SharedParametersAloneAreNoRecord) {
+    const std::string file = report_.file("shared.xml");
+    const auto review_with = [&](const std::string& inside) {
+        std::string text = good(report_);
+        const std::string section = "<generalProcessingConf>" + inside + "</generalProcessingConf>";
+        test::write_text(file, text.insert(text.find("<DCestConf>"), section));
+        ConfigurationReview review;
+        EXPECT_EQ(reviewConfiguration(file.c_str(), 1, review), 0);
+        return review;
+    };
+    const auto shared = review_with("<Memory>2048</Memory><ReportLevel>4</ReportLevel>");
+    EXPECT_THAT(shared.records, Not(testing::Contains("generalProcessingConf")));
+    ASSERT_EQ(shared.findings.size(), 1U);
+    EXPECT_EQ(shared.findings[0].name + " " + shared.findings[0].reason, "ReportLevel 4 lies above 3");
+    const auto record = review_with("<Memory>2048</Memory><Azblk>1</Azblk>");
+    EXPECT_THAT(record.records, testing::Contains("generalProcessingConf"));
+    EXPECT_EQ(record.findings.size(), 10U);
 }
 
 }  // namespace

@@ -1,10 +1,13 @@
 #include <optional>
 
+#include "diagnosticslib/call_frame.h"
 #include "quo_base/generalSAR.h"
 #include "quo_base/generalSAR_configuration.h"
+#include "quorelxmllib/header_session.h"
 
 namespace {
 
+constexpr const char* kSource = "generalSAR_configuration";
 constexpr int kSwaths = 7;
 // The numbers that DataSetInfo_Obj gives the polarisations.
 enum Polarization { kHH = 0, kVV = 1, kHV = 2, kVH = 3 };
@@ -59,19 +62,22 @@ std::optional<double> factor_of(const EnvisatCalibrationFactors& table, const Da
 }  // namespace
 
 int EnvisatCalibrationFactors::writeFactor(GeneralSAR* product) const {
-    if (!product) return QUO_REFUSED;
-    auto* info = static_cast<DataSetInfo_Obj*>(product->GSget(gsDataSetInfo));
-    const auto factor = factor_of(*this, *info);
-    if (!factor) return QUO_REFUSED;
-    info->ExternalCalibrationFactor = *factor;
-    return QUO_OK;
+    quo::CallFrame frame{"EnvisatCalibrationFactors::writeFactor", kSource};
+    if (!product) return frame.fail(QUO_REFUSED, "No product");
+    const auto factor = factor_of(*this, product->dataSetInfo);
+    if (!factor) return frame.fail(QUO_REFUSED, "No factor for this sensor, mode, image type and polarisation");
+    product->dataSetInfo.ExternalCalibrationFactor = *factor;
+    return frame.success();
 }
 
 int EnvisatCalibrationFactors::writeFactor(const char* header_file) const {
+    quo::CallFrame frame{"EnvisatCalibrationFactors::writeFactor", kSource};
+    quo::JoinedSession session{header_file};  // parses the file once, and tells whether it could be saved
     GeneralSAR product;
-    if (const int status = product.GSread(header_file)) return status;
-    int status = writeFactor(&product);
+    int status = product.GSread(header_file);
+    if (status == QUO_OK) status = writeFactor(&product);
     if (status == QUO_OK) status = product.GSwrite(header_file);
+    if (status == QUO_OK) status = session.commit();
     product.GSdestroy();
-    return status;
+    return status == QUO_OK ? frame.success() : frame.callee(status);
 }

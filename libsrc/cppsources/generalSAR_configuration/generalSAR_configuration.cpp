@@ -1,11 +1,8 @@
 #include "quo_base/generalSAR_configuration.h"
 
-#include <algorithm>
-#include <cerrno>
+#include <array>
 #include <cstdio>
 #include <limits>
-#include <span>
-#include <string>
 #include <typeinfo>
 
 #include "diagnosticslib/call_frame.h"
@@ -26,6 +23,19 @@ constexpr auto kPercent = quo::bounds(0, 100);
 constexpr auto kFraction = quo::bounds(0.0, 1.0);
 constexpr auto kLength = quo::bounds(0.0, kAnyFloat);
 using quo::note;
+
+namespace shared {
+using Obj = GeneralSAR_BaseConfiguration;
+constexpr quo::FieldTable kTable{
+    kSharedSection,
+    QUO_FIELD(Memory, kCount, note("MB", "working memory that a processor may take")),
+    QUO_FIELD(Incore, kFlag, note("", "keep intermediate results in memory")),
+    QUO_FIELD(Verbose, kCount, note("", "above 0 prints progress in detail")),
+    QUO_FIELD(ReportLevel, quo::bounds(0, 3), note("", "level of the report; 0 none")),
+    QUO_FIELD(ReportFilename, note("", "name of the report file")),
+};
+static_assert(kTable.size() == Obj::kSharedParameters);
+}  // namespace shared
 
 namespace azimuth {
 using Obj = AzimuthConf;
@@ -219,11 +229,31 @@ constexpr quo::FieldTable kTable{
 
 }  // namespace
 
-GeneralSAR_BaseConfiguration::~GeneralSAR_BaseConfiguration() = default;
 int GeneralSAR_BaseConfiguration::readpar(const char*, int) { return QUO_OK; }
 int GeneralSAR_BaseConfiguration::writepar(const char*, int) { return QUO_OK; }
 
+GeneralSAR_BaseConfiguration::~GeneralSAR_BaseConfiguration() = default;
+
+parElement GeneralSAR_BaseConfiguration::sharedParameter(int index) {
+    parElement element;
+    if (const auto* row = shared::kTable.row(index)) {
+        const quo::FieldValue field = row->at(*this);
+        element.setElement(field.name, field.pointer, field.type, field.count, field.minimum, field.maximum,
+                           false);
+    }
+    return element;
+}
+const char* GeneralSAR_BaseConfiguration::sharedUnit(int index) {
+    const auto* row = shared::kTable.row(index);
+    return row ? row->unit : "";
+}
+const char* GeneralSAR_BaseConfiguration::sharedMeaning(int index) {
+    const auto* row = shared::kTable.row(index);
+    return row ? row->meaning : "";
+}
+
 int GeneralSAR_BaseConfiguration::clone(GeneralSAR_BaseConfiguration* to) const {
+    if (!to) return QUO_REFUSED;
     to->Memory = Memory;
     to->Incore = Incore;
     to->Verbose = Verbose;
@@ -233,17 +263,20 @@ int GeneralSAR_BaseConfiguration::clone(GeneralSAR_BaseConfiguration* to) const 
 }
 
 int GeneralSAR_BaseConfiguration::readConf(const char* file, int channel, const char* section) {
-    const std::string prefix = std::string{quo::text_or_empty(section)} + '/';
     quorelxml document{file};
-    const auto read = [&](const char* name, std::int32_t& value) {
-        document.readInt(channel, (prefix + name).c_str(), &value, 1);
-    };
-    read("Memory", Memory);
-    read("Incore", Incore);
-    read("Verbose", Verbose);
-    read("ReportLevel", ReportLevel);
-    char* name = ReportFilename;
-    document.readString(channel, (prefix + "ReportFilename").c_str(), &name, 1, sizeof ReportFilename);
+    for (int i = 0; i < kSharedParameters; ++i) {
+        const parElement parameter = sharedParameter(i);
+        char path[1024];  // a longer path is cut, and leads nowhere
+        const std::string_view folder = quo::text_or_empty(section);
+        quo::format_bounded(path, sizeof path, "%.*s/%s", static_cast<int>(folder.size()), folder.data(),
+                            parameter.name);
+        if (parameter.type == parElement::typeString) {
+            char* text = static_cast<char*>(parameter.pointer);
+            document.readString(channel, path, &text, 1, parameter.room);
+        } else {
+            document.readInt(channel, path, static_cast<std::int32_t*>(parameter.pointer), 1);
+        }
+    }
     return QUO_OK;
 }
 
@@ -318,6 +351,47 @@ QUO_RECORD(CoregistrationConf, resampling)
 QUO_RECORD(CoherenceConf, coherence)
 #undef QUO_RECORD
 
+namespace {
+
+using Record = GeneralSAR_ConfigurationRecord;
+struct Kind {
+    const char* name;
+    std::unique_ptr<Record> (*make)();
+};
+template <typename Class>
+constexpr Kind kind(const char* name) {
+    return {name, []() -> std::unique_ptr<Record> { return std::make_unique<Class>(); }};
+}
+constexpr std::array kKinds{
+    kind<AzimuthConf>(azimuth::kTable.section()),
+    kind<DCestConf>(doppler::kTable.section()),
+    kind<ExtractorConf>(extractor::kTable.section()),
+    kind<generalProcessingConf>(processing::kTable.section()),
+    kind<FinefitestConf>(fine::kTable.section()),
+    kind<EnvisatCalibrationFactors>(calibration::kTable.section()),
+    kind<DemExtractorConf>(dem::kTable.section()),
+    kind<GeocodingConf>(geocoding::kTable.section()),
+    kind<ATPrecise_FitestConf>(precise::kTable.section()),
+    kind<CoregistrationConf>(resampling::kTable.section()),
+    kind<CoherenceConf>(coherence::kTable.section()),
+};
+constexpr auto kNames = [] {
+    std::array<const char*, kKinds.size()> names{};
+    for (std::size_t i = 0; i < names.size(); ++i) names[i] = kKinds[i].name;
+    return names;
+}();
+
+}  // namespace
+
+std::span<const char* const> Record::names() { return kNames; }
+
+std::unique_ptr<Record> Record::make(std::string_view name) {
+    for (const Kind& kind : kKinds) {
+        if (name == kind.name) return kind.make();
+    }
+    return nullptr;
+}
+
 generalProcessingConf::generalProcessingConf(const char* file, int channel) : generalProcessingConf{} {
     readpar(file, channel);
 }
@@ -351,10 +425,13 @@ int GeneralSAR_configuration::GSwrite(const char* file, int channel) {
 
 int GeneralSAR_configuration::GSread(const char* file, int channel) {
     quo::CallFrame frame{"GeneralSAR_configuration::GSread", kSource};
-    if (!quo::Stream{std::fopen(file, "rb")}) {
-        errno = 0;
-        const std::string message = "File : " + std::string{quo::text_or_empty(file)} + " DOES NOT EXIST!";
-        return frame.fail(QUO_REFUSED, message.c_str());
+    if (!file || !quo::Stream{std::fopen(file, "rb")}) {
+        quo::CallFrame::drop_errno();  // the entry says it all
+        char message[2048];
+        const std::string_view name = quo::text_or_empty(file);
+        quo::format_bounded(message, sizeof message, "File : %.*s DOES NOT EXIST!", static_cast<int>(name.size()),
+                            name.data());
+        return frame.fail(QUO_REFUSED, message);
     }
     for (int i = 0; i < kSelectors; ++i) {
         enabled_[i] = true;
@@ -364,6 +441,7 @@ int GeneralSAR_configuration::GSread(const char* file, int channel) {
 }
 
 int GeneralSAR_configuration::GSclone(GeneralSAR_configuration* to) const {
+    if (!to) return QUO_REFUSED;
     for (int i = 0; i < kSelectors; ++i) {
         if (!enabled_[i]) continue;
         table_[i]->clone(to->table_[i]);

@@ -1,0 +1,189 @@
+#include <cmath>
+#include <cstdint>
+#include <map>
+#include <memory>
+#include <new>
+#include <string>
+#include <string_view>
+#include <utility>
+
+#include "diagnosticslib/call_frame.h"
+#include "quo_base/generalSAR_configuration.h"
+#include "quorelxmllib/header_document.h"
+#include "sarutillib/number_text.h"
+
+namespace {
+
+using Record = GeneralSAR_ConfigurationRecord;
+
+constexpr const char* kSource = "generalSAR_configuration";
+constexpr std::size_t kLongestQuote = 40;
+
+std::string_view name_of(const xmlNode* node) { return reinterpret_cast<const char*>(node->name); }
+
+std::string_view trimmed(std::string_view text) {
+    constexpr std::string_view kBlanks = " \t\r\n";
+    const auto first = text.find_first_not_of(kBlanks);
+    if (first == std::string_view::npos) return {};
+    return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
+}
+
+std::string quoted(std::string_view text) {
+    const bool cut = text.size() > kLongestQuote;
+    return '"' + std::string{text.substr(0, kLongestQuote)} + (cut ? "...\"" : "\"");
+}
+
+std::string digits(double value) { return quo::format_exact(value).data; }
+
+std::string count_reason(int count, int expected) {
+    return "has " + std::to_string(count) + (count == 1 ? " value, not " : " values, not ") +
+           std::to_string(expected);
+}
+
+// What is wrong with one value, or nothing.
+std::string value_reason(const parElement& element, std::string_view raw) {
+    if (element.type == parElement::typeString) {
+        if (raw.size() < element.room) return "";
+        return "has " + std::to_string(raw.size()) + " bytes, more than " + std::to_string(element.room - 1);
+    }
+    const std::string_view text = trimmed(raw);
+    const bool whole = element.type == parElement::typeInt;
+    const auto number = quo::scan_double(text);
+    const std::size_t length = whole ? quo::scan_int64(text).length : number.length;
+    if (length == 0 || length != text.size())
+        return quoted(text) + (whole ? " is no whole number" : " is no number");
+    if (!std::isfinite(number.value)) return quoted(text) + " is not finite";
+    const bool bounded = element.minimum != 0.0 || element.maximum != 0.0;
+    if (bounded && number.value < element.minimum)
+        return std::string{text} + " lies below " + digits(element.minimum);
+    if (bounded && number.value > element.maximum)
+        return std::string{text} + " lies above " + digits(element.maximum);
+    return "";
+}
+
+/** Goes through the values of an array as they are read: `val` elements, or else one list. */
+class ArrayCheck {
+public:
+    ArrayCheck(const parElement& element, const xmlNode* node) : element_{element} {
+        for (xmlNode* child = node->children; child; child = child->next) {
+            if (quo::is_named(child, "val")) see(quo::NodeText{child});
+        }
+        if (count_ == 0) see_list(quo::NodeText{const_cast<xmlNode*>(node)});
+    }
+    [[nodiscard]] std::string reason() const {
+        return count_ != element_.count ? count_reason(count_, element_.count) : reason_;
+    }
+
+private:
+    void see(std::string_view text) {
+        ++count_;
+        if (reason_.empty()) reason_ = value_reason(element_, text);
+    }
+    void see_list(std::string_view list) {
+        while (!trimmed(list).empty()) {
+            const auto comma = list.find(',');
+            see(list.substr(0, comma));
+            list = comma == std::string_view::npos ? std::string_view{} : list.substr(comma + 1);
+        }
+    }
+
+    const parElement& element_;
+    int count_ = 0;
+    std::string reason_;
+};
+
+/** Compares one section with its record. */
+class SectionReview {
+public:
+    SectionReview(Record& record, std::vector<ConfigurationFinding>& findings)
+        : record_{record}, findings_{findings} {
+        for (int i = 0; i < record.elementCount(); ++i) add(*record.element(i), true);
+        own_ = elements_.size();
+        if (record.section() != std::string_view{"generalProcessingConf"}) return;
+        for (int i = 0; i < Record::kSharedParameters; ++i) add(record.sharedParameter(i), false);
+    }
+
+    /** Whether the section is the record and not the shared parameters alone. */
+    bool run(const xmlNode* section) {
+        for (const xmlNode* child = section->children; child; child = child->next) {
+            if (child->type == XML_ELEMENT_NODE) see(child);
+        }
+        const bool is_record = seen_own_ || elements_.size() == own_;
+        if (!is_record) return false;
+        for (int i = 0; i < record_.elementCount(); ++i) {
+            const char* name = record_.element(i)->name;
+            if (!elements_[name].seen) find(name, "is missing");
+        }
+        return true;
+    }
+
+private:
+    struct Expected {
+        parElement element;
+        bool own = false, seen = false;
+    };
+    void add(const parElement& element, bool own) { elements_[element.name] = {element, own}; }
+    void find(std::string_view name, std::string reason) {
+        findings_.push_back({record_.section(), std::string{name}, std::move(reason)});
+    }
+    void see(const xmlNode* node) {
+        const auto found = elements_.find(name_of(node));
+        if (found == elements_.end() || node->ns) return find(name_of(node), "is unknown");
+        Expected& expected = found->second;
+        seen_own_ = seen_own_ || expected.own;
+        if (std::exchange(expected.seen, true)) return find(name_of(node), "stands there more than once");
+        std::string reason = expected.element.count > 1
+                                 ? ArrayCheck{expected.element, node}.reason()
+                                 : value_reason(expected.element, quo::NodeText{const_cast<xmlNode*>(node)});
+        if (!reason.empty()) find(name_of(node), std::move(reason));
+    }
+
+    Record& record_;
+    std::vector<ConfigurationFinding>& findings_;
+    std::map<std::string, Expected, std::less<>> elements_;
+    std::size_t own_ = 0;
+    bool seen_own_ = false;
+};
+
+void review_section(const xmlNode* section, std::map<std::string, bool, std::less<>>& seen,
+                    ConfigurationReview& review) {
+    const std::string name{name_of(section)};
+    const auto record = section->ns ? nullptr : Record::make(name);
+    if (!record) {
+        review.findings.push_back({name, "", "is no configuration record"});
+    } else if (std::exchange(seen[name], true)) {
+        review.findings.push_back({name, "", "stands there more than once"});
+    } else if (SectionReview{*record, review.findings}.run(section)) {
+        review.records.push_back(name);
+    }
+}
+
+int review_file(const char* file, int channel, ConfigurationReview& review) {
+    std::shared_ptr<quo::HeaderDocument> document;
+    if (const int status = quo::HeaderDocument::load(file, document)) return status;
+    if (!document->is_header()) return QUO_REFUSED;
+    std::map<std::string, bool, std::less<>> seen;
+    document->visit(channel, "", [&](const xmlNode* node) {
+        for (const xmlNode* section = node->children; section; section = section->next) {
+            if (section->type == XML_ELEMENT_NODE) review_section(section, seen, review);
+        }
+        return true;
+    });
+    return QUO_OK;
+}
+
+}  // namespace
+
+int reviewConfiguration(const char* file, int channel, ConfigurationReview& review) {
+    quo::CallFrame frame{"reviewConfiguration", kSource};
+    review = {};
+    try {
+        const int status = file ? review_file(file, channel, review) : QUO_REFUSED;
+        quo::CallFrame::drop_errno();
+        if (status == QUO_REFUSED) return frame.fail(status, "The file is missing or no configuration file");
+        if (status == QUO_OK) return frame.success();
+    } catch (const std::bad_alloc&) {
+        quo::CallFrame::drop_errno();
+    }
+    return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
+}
