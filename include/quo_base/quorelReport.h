@@ -8,8 +8,10 @@
  *
  * All report state is process-wide; objects of quorelReport hold nothing of their own. */
 
-/** The one exception type of the library: a message and a source position. Each text is cut at 511 bytes. */
-class QUO_BASE_API quorelException {
+/** The one exception type of the library: a message and a source position. Each text is cut at 511 bytes.
+ *
+ * Visible in programs that hide their own symbols, too, so that it is one type on both sides of the library. */
+class __attribute__((visibility("default"))) quorelException {
 public:
     /** "generic quorel exception.\n" at line 0 of no function; keeps the current errno. */
     quorelException() noexcept;

@@ -14,9 +14,19 @@ run(${CMAKE_COMMAND} --install "${BUILD}" --prefix "${prefix}")
 run(${CMAKE_COMMAND} -S "${SOURCE}" -B "${WORK}/build" -G Ninja -D CMAKE_BUILD_TYPE=Release
     "-DCMAKE_PREFIX_PATH=${prefix}" -D CMAKE_CXX_COMPILER=${CXX} -D CMAKE_C_COMPILER=${C})
 run(${CMAKE_COMMAND} --build "${WORK}/build")
-foreach(program IN ITEMS consumer_cpp consumer_c)
+foreach(program IN ITEMS consumer_cpp consumer_exception consumer_c)
     run("${WORK}/build/${program}" "${WORK}")
 endforeach()
+
+# Each of the four wrong calls must be an error of its own.
+set(ENV{LC_ALL} C)
+execute_process(COMMAND ${CXX} -std=c++20 -fsyntax-only -Werror=format "-I${prefix}/include"
+    "${SOURCE}/wrong_formats.cpp" ERROR_VARIABLE errors)
+string(REGEX MATCHALL "wrong_formats.cpp:[0-9]+:[0-9]+: error: " found "${errors}")
+list(LENGTH found count)
+if(NOT count EQUAL 4)
+    message(FATAL_ERROR "Wrong formats are not noticed:\n${errors}")
+endif()
 
 file(GLOB_RECURSE pc "${prefix}/*/quo_base.pc")
 get_filename_component(pc_dir "${pc}" DIRECTORY)

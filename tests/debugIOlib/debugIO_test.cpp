@@ -1,7 +1,11 @@
 #include "quo_base/debugIO.h"
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
+#include <unistd.h>
 
+#include <cerrno>
+#include <cstdio>
 #include <cstring>
 #include <limits>
 #include <string>
@@ -85,6 +89,21 @@ TEST(Waitbar, SpeaksItsLines) {
     EXPECT_EQ(captured.text(),
               "USE_WAITBAR\nSET_TITLE: Focusing 100%s\nSET_WAITBAR: 0.500000 \nSET_WAITBAR: -0.333333 \n"
               "SET_WAITBAR: 340282346638528859811704183484516925440.000000 \nCLOSE_WAITBAR\n");
+}
+
+// A stream that nobody can write to used to leave its error number to the next tracked function.
+TEST(Waitbar, LeavesNoErrorBehindWhereNobodyListens) {
+    const int kept = dup(STDERR_FILENO), unwritable = open("/dev/null", O_RDONLY);
+    dup2(unwritable, STDERR_FILENO);
+    errno = 0;
+    EXPECT_EQ(waitbar_open("Focusing"), 0);
+    EXPECT_EQ(waitbar_update(0.5F), 0);
+    EXPECT_EQ(waitbar_close(), 0);
+    EXPECT_EQ(errno, 0);
+    dup2(kept, STDERR_FILENO);
+    close(kept);
+    close(unwritable);
+    std::clearerr(stderr);
 }
 
 TEST(Waitbar, CutsALongTitle) {

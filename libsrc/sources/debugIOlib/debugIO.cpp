@@ -7,6 +7,7 @@
 #include <optional>
 
 #include "diagnosticslib/call_frame.h"
+#include "diagnosticslib/errno_kept.h"
 #include "sarutillib/bounded_text.h"
 #include "sarutillib/checked_size.h"
 #include "sarutillib/file_io.h"
@@ -66,6 +67,7 @@ int write_debug(const char* file_name, const void* data, int type, int first, in
 }
 
 int waitbar_open(const char* title) noexcept {
+    const quo::ErrnoKept kept;  // nobody has to listen
     std::fputs("USE_WAITBAR\n", stderr);
     quo::format_bounded(waitbar_line, sizeof waitbar_line, "SET_TITLE: %.499s\n", title ? title : "");
     send_line();
@@ -74,6 +76,7 @@ int waitbar_open(const char* title) noexcept {
 }
 
 int waitbar_update(float value) noexcept {
+    const quo::ErrnoKept kept;  // nobody has to listen
     format_progress(value);
     send_line();
     std::fflush(stderr);
@@ -81,6 +84,7 @@ int waitbar_update(float value) noexcept {
 }
 
 int waitbar_close() noexcept {
+    const quo::ErrnoKept kept;  // nobody has to listen
     quo::copy_bounded(waitbar_line, "CLOSE_WAITBAR\n");
     send_line();
     return QUO_OK;
