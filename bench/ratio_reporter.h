@@ -47,8 +47,17 @@ private:
     std::map<std::string, double> best_;
 };
 
-/** Runs the registered benchmarks and prints the ratios; the result is the program's exit status. */
+/** Runs the registered benchmarks and prints the ratios; the result is the program's exit status. Benchmarks take
+ * turns in many short runs, so that what disturbs the machine for a while meets both sides of a ratio; options on
+ * the command line come later and win. */
 inline int run(int argc, char** argv, const std::vector<Ratio>& ratios) {
+    std::string turns[] = {"--benchmark_enable_random_interleaving=true", "--benchmark_repetitions=15",
+                           "--benchmark_min_time=0.03"};
+    std::vector<char*> arguments{argv[0]};
+    for (std::string& option : turns) arguments.push_back(option.data());
+    arguments.insert(arguments.end(), argv + 1, argv + argc);
+    argc = static_cast<int>(arguments.size());
+    argv = arguments.data();
     benchmark::Initialize(&argc, argv);
     if (benchmark::ReportUnrecognizedArguments(argc, argv)) return 1;
     RatioReporter reporter;
