@@ -1,0 +1,44 @@
+#include "targets.h"
+
+#include <cerrno>
+#include <fstream>
+#include <sstream>
+
+#include "session.h"
+
+namespace example {
+
+Point Target::position() const { return geodetic_point(latitude_deg, longitude_deg, height_m); }
+
+namespace {
+
+Target parse_target(const std::string& line) {
+    Target target{};
+    std::istringstream cells{line};
+    char comma[3];
+    std::getline(cells, target.name, ',');
+    cells >> target.latitude_deg >> comma[0] >> target.longitude_deg >> comma[1] >> target.height_m >> comma[2] >>
+        target.strength;
+    const bool separated = comma[0] == ',' && comma[1] == ',' && comma[2] == ',';
+    if (cells.fail() || !separated) throw Failure{"\"" + line + "\": no target"};
+    return target;
+}
+
+}  // namespace
+
+std::vector<Target> read_targets(const std::string& file) {
+    std::ifstream stream{file};
+    if (!stream) throw Failure{file + ": cannot be read", QUO_NOT_OPENED};
+    std::vector<Target> targets;
+    bool names_passed = false;
+    for (std::string line; std::getline(stream, line);) {
+        if (line.empty() || line[0] == '#') continue;
+        if (names_passed) targets.push_back(parse_target(line));
+        names_passed = true;
+    }
+    if (targets.empty()) throw Failure{file + ": no targets"};
+    errno = 0;  // what the stream left would count as an error of the next function of the library
+    return targets;
+}
+
+}  // namespace example

@@ -1,0 +1,27 @@
+#ifndef QUO_EXAMPLES_TARGETS_H
+#define QUO_EXAMPLES_TARGETS_H
+
+#include <string>
+#include <vector>
+
+#include "geometry.h"
+
+namespace example {
+
+/** A point target: a reflector that gives back an echo of the same strength from every direction. */
+struct Target {
+    std::string name;
+    double latitude_deg, longitude_deg;  // geodetic, WGS84
+    double height_m;                     // above the ellipsoid
+    double strength;                     // amplitude of its echo
+
+    [[nodiscard]] Point position() const;
+};
+
+/** Reads targets from a table of comma-separated values with the columns name, latitude_deg, longitude_deg,
+ * height_m, strength, in this order, under a line of column names. Lines that begin with # are skipped. */
+std::vector<Target> read_targets(const std::string& file);
+
+}  // namespace example
+
+#endif

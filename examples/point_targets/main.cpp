@@ -1,0 +1,23 @@
+// Measures point targets in a focused image: position, resolution, sidelobes, phase.
+#include <CLI/CLI.hpp>
+#include <algorithm>
+#include <cstdio>
+#include <string>
+
+#include "../common/session.h"
+#include "measure.h"
+
+int main(int argc, char** argv) {
+    CLI::App app{"Measures point targets in a focused image"};
+    std::string image, targets;
+    app.add_option("image", image, "Focused image; its product header is IMAGE.hdr")->required();
+    app.add_option("targets", targets, "Table of targets: name,latitude_deg,longitude_deg,height_m,strength")
+        ->required();
+    CLI11_PARSE(app, argc, argv);
+    return example::run_program("Point targets", image + ".targets.report.txt", "", 1, [&] {
+        const auto found = example::measure(image, example::read_targets(targets));
+        example::print_table(stdout, found);
+        if (!std::all_of(found.begin(), found.end(), example::within_bounds))
+            throw example::Failure{"a target is further off than 0.1 samples, 5 % in resolution or 0.1 rad"};
+    });
+}

@@ -1,0 +1,217 @@
+#include "measure.h"
+
+#include <algorithm>
+#include <cmath>
+#include <complex>
+#include <numbers>
+
+#include "../common/session.h"
+#include "quo_base/generalSAR.h"
+#include "quo_base/interp.h"
+
+namespace example {
+namespace {
+
+constexpr double kPi = std::numbers::pi;
+constexpr int kChip = 64;   // lines and samples that are looked at
+constexpr int kFiner = 16;  // places between two of them
+constexpr int kFine = kChip * kFiner;
+
+/** An image around a target, finely interpolated: kFine rows of azimuth by kFine columns of range. */
+class Chip {
+public:
+    Chip(BufferFile& image, int line, int sample, double doppler_cycles);
+
+    [[nodiscard]] fcomplex at(int row, int column) const {
+        return fine_[static_cast<std::size_t>(row) * kFine + static_cast<std::size_t>(column)];
+    }
+    [[nodiscard]] double power(int row, int column) const {
+        return static_cast<double>(std::norm(at(row, column)));
+    }
+    struct Place {
+        int row, column;
+    };
+    [[nodiscard]] Place brightest() const;
+
+private:
+    std::vector<fcomplex> fine_;
+};
+
+Chip::Chip(BufferFile& image, int line, int sample, double doppler_cycles) {
+    constexpr auto kSize = static_cast<std::size_t>(kChip) * kChip;
+    const int first_line = line - kChip / 2, first_sample = sample - kChip / 2;
+    if (first_line < 0 || first_sample < 0 || first_line + kChip > image.getLines() ||
+        first_sample + kChip > image.getSamples())
+        throw Failure{"a target lies outside the image, or at its border"};
+    std::vector<fcomplex> chip(kSize), turned(kSize);
+    image.readbuffer(chip.data(), first_line, kChip, first_sample, kChip);
+
+    // The phase ramp of the Doppler centroid runs along azimuth, demodulationPhase along rows.
+    for (std::size_t i = 0; i < kSize; ++i) turned[i % kChip * kChip + i / kChip] = chip[i];
+    const demodulationPhase centroid{2.0 * kPi * doppler_cycles};
+    require(centroid.applyDemodPhase(turned.data(), kChip, kChip), "the Doppler centroid");
+
+    interp finer;
+    std::vector<fcomplex> tall(kSize * kFiner);
+    fine_.resize(kSize * kFiner * kFiner);
+    require(finer.interpft(turned.data(), kChip, kChip, kChip, kFine, tall.data()), "interpolation in range");
+    std::vector<fcomplex> wide(fine_.size());
+    require(finer.interpft(tall.data(), kChip, kFine, kFine, kFine, wide.data()), "interpolation in azimuth");
+    for (std::size_t i = 0; i < wide.size(); ++i) fine_[i % kFine * kFine + i / kFine] = wide[i];
+}
+
+/** The brightest place; not at the border, where the image's other end shines in. */
+Chip::Place Chip::brightest() const {
+    constexpr int kBorder = kFine / 8;
+    Place place{kBorder, kBorder};
+    for (int row = kBorder; row < kFine - kBorder; ++row)
+        for (int column = kBorder; column < kFine - kBorder; ++column)
+            if (power(row, column) > power(place.row, place.column)) place = {row, column};
+    return place;
+}
+
+/** Where the parabola through three neighbouring values peaks, relative to the middle one. */
+double parabola_peak(double before, double middle, double after) {
+    return 0.5 * (before - after) / (before - 2.0 * middle + after);
+}
+
+/** A cut through the peak: power at fine steps. */
+struct Cut {
+    std::vector<double> power;
+    int peak;
+};
+
+/** Steps from the peak to the place where the power falls below a level, to one side. */
+double steps_to(const Cut& cut, double level, int direction) {
+    for (int i = cut.peak; i > 0 && i + 1 < static_cast<int>(cut.power.size()); i += direction) {
+        const double here = cut.power[static_cast<std::size_t>(i)];
+        const double next = cut.power[static_cast<std::size_t>(i + direction)];
+        if (next < level) return std::abs(i - cut.peak) + (here - level) / (here - next);
+    }
+    throw Failure{"a response without an end"};
+}
+
+/** The first minimum to one side of the peak. */
+int null_of(const Cut& cut, int direction) {
+    int i = cut.peak;
+    while (i > 0 && i + 1 < static_cast<int>(cut.power.size()) &&
+           cut.power[static_cast<std::size_t>(i + direction)] < cut.power[static_cast<std::size_t>(i)])
+        i += direction;
+    return i;
+}
+
+Response respond(const Cut& cut, double shift, double theory) {
+    const double top = cut.power[static_cast<std::size_t>(cut.peak)];
+    const double width = steps_to(cut, 0.5 * top, -1) + steps_to(cut, 0.5 * top, +1);
+    const int left = null_of(cut, -1), right = null_of(cut, +1);
+    const int reach = static_cast<int>(10.0 * theory * kFiner);
+    double main = 0.0, side = 0.0, highest = 0.0;
+    for (int i = std::max(0, cut.peak - reach); i <= std::min(kFine - 1, cut.peak + reach); ++i) {
+        const double power = cut.power[static_cast<std::size_t>(i)];
+        const bool inside = i >= left && i <= right;
+        (inside ? main : side) += power;
+        if (!inside) highest = std::max(highest, power);
+    }
+    return {shift, width / kFiner, theory, 10.0 * std::log10(highest / top), 10.0 * std::log10(side / main)};
+}
+
+/** Finds one target after the other in an open image. */
+class Finder {
+public:
+    explicit Finder(const std::string& image);
+    Measurement find(const Target& target);
+
+private:
+    GeneralSAR product_;
+};
+
+Finder::Finder(const std::string& image) {
+    const std::string header = image + ".hdr";
+    require(product_.GSread(header.c_str()), header + ": cannot be read");
+    for (const GSObject object : {gsOrbit, gsRoi, gsPolySAR, gsSamplingConstants, gsBufferFile})
+        if (!product_.GSexists(object)) throw Failure{header + ": a section is missing"};
+    product_.bufferFile.setFilename(image.c_str());
+    product_.bufferFile.open(BufferFile::READ);
+    if (!product_.bufferFile.is_open()) throw Failure{image + ": cannot be read", QUO_NOT_OPENED};
+}
+
+Measurement Finder::find(const Target& target) {
+    const ROI_Obj& roi = product_.roi.Roi;
+    const SamplingConstants_Obj& sampling = product_.samplingConstants;
+    const Point point = target.position();
+    double azimuth_s = 0.0, range_s = 0.0, doppler_hz = 0.0;
+    require(product_.orbit.earth2sat(point.data(), &azimuth_s, &range_s), target.name + " is not seen");
+    require(product_.polynomials.EvaluateDC(range_s, azimuth_s, &doppler_hz), "the Doppler centroid");
+    const double line = (azimuth_s - roi.SlowStartTime) / roi.SlowTimeDelta;
+    const double sample = (range_s - roi.FastStartTime) / roi.FastTimeDelta;
+    const int middle_line = static_cast<int>(std::lround(line));
+    const int middle_sample = static_cast<int>(std::lround(sample));
+    const Chip chip{product_.bufferFile, middle_line, middle_sample, doppler_hz * roi.SlowTimeDelta};
+
+    const auto [row, column] = chip.brightest();
+    const auto amplitude = [&](int r, int c) { return std::sqrt(chip.power(r, c)); };
+    const double top = amplitude(row, column);
+    const double rows = row + parabola_peak(amplitude(row - 1, column), top, amplitude(row + 1, column));
+    const double columns = column + parabola_peak(amplitude(row, column - 1), top, amplitude(row, column + 1));
+    const double chip_line = rows / kFiner;  // after the chip's first line
+    const double peak_line = middle_line - kChip / 2 + chip_line;
+    const double peak_sample = middle_sample - kChip / 2 + columns / kFiner;
+
+    Cut along{{}, row}, across{{}, column};
+    for (int i = 0; i < kFine; ++i) {
+        along.power.push_back(chip.power(i, column));
+        across.power.push_back(chip.power(row, i));
+    }
+    Measurement found{};
+    found.name = target.name;
+    found.azimuth = respond(along, peak_line - line, 0.886 * sampling.prf_hz / sampling.Baz_hz);
+    found.range = respond(across, peak_sample - sample, 0.886 * sampling.frg_hz / sampling.Brg_hz);
+    const Point located = ground_point(product_.orbit, roi.SlowStartTime + peak_line * roi.SlowTimeDelta,
+                                       roi.FastStartTime + peak_sample * roi.FastTimeDelta, target.height_m);
+    found.ground_m = length(located - point);
+    found.strength_db = 20.0 * std::log10(top / target.strength);
+    // The centroid's ramp is put on again at the peak; between the fine places the phase hardly changes without
+    // it.
+    const double phase = static_cast<double>(std::arg(chip.at(row, column))) +
+                         2.0 * kPi * doppler_hz * roi.SlowTimeDelta * chip_line;
+    found.phase_rad = std::remainder(phase + 2.0 * kPi * range_s * kLightSpeed / sampling.lambda_m, 2.0 * kPi);
+    return found;
+}
+
+void print_response(std::FILE* out, const Response& response) {
+    std::fprintf(out, " %+7.3f %6.3f %+6.2f %7.2f %7.2f", response.shift, response.resolution,
+                 100.0 * (response.resolution / response.theory - 1.0), response.side_lobe_db,
+                 response.integrated_db);
+}
+
+}  // namespace
+
+std::vector<Measurement> measure(const std::string& image, const std::vector<Target>& targets) {
+    Finder finder{image};
+    std::vector<Measurement> found;
+    for (const Target& target : targets) found.push_back(finder.find(target));
+    return found;
+}
+
+void print_table(std::FILE* out, const std::vector<Measurement>& measurements) {
+    std::fprintf(out, "%-10s|%-37s|%-37s|\n", "", " azimuth, lines", " range, samples");
+    std::fprintf(out, "%-10s|%8s%7s%7s%8s%7s |%8s%7s%7s%8s%7s | %8s %8s %8s\n", "target", "shift", "width", "%",
+                 "PSLR", "ISLR", "shift", "width", "%", "PSLR", "ISLR", "ground m", "phase", "ampl. dB");
+    for (const Measurement& measurement : measurements) {
+        std::fprintf(out, "%-10s|", measurement.name.c_str());
+        print_response(out, measurement.azimuth);
+        std::fprintf(out, "|");
+        print_response(out, measurement.range);
+        std::fprintf(out, "| %8.3f %+8.4f %+8.3f\n", measurement.ground_m, measurement.phase_rad,
+                     measurement.strength_db);
+    }
+}
+
+bool within_bounds(const Measurement& measurement) {
+    const auto good = [](const Response& response) {
+        return std::abs(response.shift) < 0.1 && std::abs(response.resolution / response.theory - 1.0) < 0.05;
+    };
+    return good(measurement.azimuth) && good(measurement.range) && std::abs(measurement.phase_rad) < 0.1;
+}
+
+}  // namespace example

@@ -1,0 +1,44 @@
+#ifndef QUO_EXAMPLES_MEASURE_H
+#define QUO_EXAMPLES_MEASURE_H
+
+#include <cstdio>
+#include <string>
+#include <vector>
+
+#include "../common/targets.h"
+
+namespace example {
+
+/** The response to a point along one axis. */
+struct Response {
+    double shift;          // of the peak from where the target should be, samples or lines
+    double resolution;     // width at half the power, samples or lines
+    double theory;         // 0.886 / bandwidth, in the same unit: what a flat band gives
+    double side_lobe_db;   // highest sidelobe against the peak
+    double integrated_db;  // energy of the sidelobes, ten resolution cells to each side, against the main lobe's
+};
+
+/** What was found of a target in a focused image. */
+struct Measurement {
+    std::string name;
+    Response azimuth, range;
+    double ground_m;     // distance of the located peak from the given position
+    double phase_rad;    // at the peak, against -4 pi R / lambda
+    double strength_db;  // amplitude at the peak, against the given strength
+};
+
+/** Finds the targets in an image whose product header is "<image>.hdr" and measures their responses.
+ *
+ * A target is expected where the orbit passes it at zero Doppler, within some lines and samples. The image is
+ * interpolated there by zero-padding its spectrum, after its Doppler centroid was taken off. Throws Failure. */
+std::vector<Measurement> measure(const std::string& image, const std::vector<Target>& targets);
+
+/** Prints the measurements as a table. */
+void print_table(std::FILE* out, const std::vector<Measurement>& measurements);
+
+/** Whether position, resolution and phase are within 0.1 samples, 5 % and 0.1 rad of what they should be. */
+bool within_bounds(const Measurement& measurement);
+
+}  // namespace example
+
+#endif

@@ -1,0 +1,250 @@
+#include "focus.h"
+
+#include <algorithm>
+#include <cstdint>
+#include <cstdio>
+#include <filesystem>
+#include <optional>
+
+#include "../common/geometry.h"
+#include "../common/progress.h"
+#include "azimuth_focusing.h"
+#include "quo_base/generalSAR.h"
+#include "range_compression.h"
+
+namespace example {
+namespace {
+
+constexpr double kRangeShare = 0.3;  // of the time that range compression takes, about
+
+/** One run of the processor. */
+class Processor {
+public:
+    Processor(const FocusJob& job, const AzimuthConf& azimuth, const generalProcessingConf& processing)
+        : job_{job}, conf_{azimuth}, processing_{processing}, progress_{"Focusing", job.waitbar} {}
+    FocusResult run();
+
+private:
+    void read_header();
+    void check_memory(int lines, int samples) const;
+    void compress_range();
+    void read_raw(RangeCompression& compression, int first, int lines);
+    void focus_azimuth();
+    void focus_strip(AzimuthFocusing& focusing, DataFile& image, int strip_line);
+    void read_block(AzimuthFocusing& focusing, int first_line, int first_sample);
+    void write_block(AzimuthFocusing& focusing, DataFile& image, int line, int sample);
+    void write_header();
+
+    FocusJob job_;
+    const AzimuthConf& conf_;
+    const generalProcessingConf& processing_;
+    Progress progress_;
+    Stopwatch stopwatch_;
+    GeneralSAR product_;
+    DopplerBand band_{};
+    ROI_Obj data_;  // the compressed data
+    DataFile compressed_;
+    BlockLayout layout_{};
+};
+
+void Processor::read_header() {
+    const std::string header = job_.raw + ".hdr";
+    require(product_.GSread(header.c_str()), header + ": cannot be read");
+    constexpr GSObject kNeeded[] = {gsRoi,   gsPolySAR,     gsSamplingConstants, gsOrbit,
+                                    gsPulse, gsDataSetInfo, gsBufferFile};
+    for (const GSObject object : kNeeded)
+        if (!product_.GSexists(object)) throw Failure{header + ": a section that the processor needs is missing"};
+    BufferFile& raw = product_.bufferFile;
+    std::error_code failure;
+    const auto bytes = static_cast<std::int64_t>(std::filesystem::file_size(job_.raw, failure));
+    if (failure || raw.rasterSize() < 0 || bytes < raw.rasterSize())
+        throw Failure{job_.raw + ": not as long as its header says", QUO_READ_FAILED};
+    if (raw.getLines() != product_.roi.Roi.Lines || raw.getSamples() != product_.roi.Roi.Samples)
+        throw Failure{header + ": raster and region differ in size"};
+    const SamplingConstants_Obj& sampling = product_.samplingConstants;
+    band_.prf_hz = sampling.prf_hz;
+    band_.hamming = static_cast<double>(conf_.AzimuthWindowHammingParameter);
+    band_.width_hz = sampling.Baz_hz > 0.0 ? sampling.Baz_hz : 0.8 * sampling.prf_hz;
+    if (conf_.AzimuthLookBandwidth > 0.0F) band_.width_hz = static_cast<double>(conf_.AzimuthLookBandwidth);
+    if (!(band_.prf_hz > 0.0 && band_.width_hz <= band_.prf_hz))
+        throw Failure{header + ": no PRF, or too low a PRF"};
+}
+
+void Processor::check_memory(int lines, int samples) const {
+    const double megabytes = static_cast<double>(lines) * samples * sizeof(fcomplex) / 1048576.0;
+    if (megabytes > processing_.Memory)
+        throw Failure{"a block takes " + std::to_string(static_cast<int>(megabytes) + 1) + " MB, more than Memory",
+                      QUO_NO_MEMORY};
+}
+
+DataFile& describe(DataFile& raster, const std::string& name, int lines, int samples) {
+    require(raster.setFilename(name.c_str()), name + ": the name is too long");
+    raster.NrOfLinesPerImage = lines;
+    raster.NrOfPixelsPerLine = samples;
+    raster.CellType = FLOAT_COMPLEX;
+    return raster;
+}
+
+void Processor::read_raw(RangeCompression& compression, int first, int lines) {
+    Block& block = compression.block();
+    for (int line = 0; line < lines; ++line) {
+        fcomplex* samples = block.line(line);
+        product_.bufferFile.readbuffer(samples, first + line, 1, 0, 0);
+        std::fill(samples + product_.roi.Roi.Samples, samples + block.samples(), fcomplex{});
+    }
+}
+
+/** Compresses the raw lines into the intermediate raster. */
+void Processor::compress_range() {
+    const int raw_samples = product_.roi.Roi.Samples, lines = product_.roi.Roi.Lines;
+    const std::int64_t block_size = std::int64_t{conf_.LinesInBlock} * conf_.SamplesInBlock;
+    const int block_lines = static_cast<int>(std::clamp<std::int64_t>(block_size / raw_samples, 1, lines));
+    check_memory(block_lines, raw_samples);
+    std::optional<RangeCompression> made;
+    stopwatch_.time(Work::kPlanning, [&] { made.emplace(product_.pulse, conf_, raw_samples, block_lines); });
+    RangeCompression& compression = *made;
+
+    data_.SetSlowAxe(product_.roi.Roi.SlowStartTime, 1.0 / band_.prf_hz, lines);
+    data_.SetFastAxe(product_.roi.Roi.FastStartTime + compression.delay_s(), product_.roi.Roi.FastTimeDelta,
+                     compression.samples());
+    describe(compressed_, job_.image + ".rc", lines, data_.Samples);
+    require(compressed_.open(1), std::string{compressed_.FileName} + ": cannot be written");
+    product_.bufferFile.open(BufferFile::READ);
+    for (int first = 0; first < lines; first += block_lines) {
+        const int count = std::min(block_lines, lines - first);
+        stopwatch_.time(Work::kReading, [&] { read_raw(compression, first, count); });
+        stopwatch_.time(Work::kTransforms, [&] { compression.transform(); });
+        stopwatch_.time(Work::kFilters, [&] { compression.filter(); });
+        stopwatch_.time(Work::kTransforms, [&] { compression.transform_back(); });
+        stopwatch_.time(Work::kWriting, [&] {
+            BufferIO region{&compressed_, 0, data_.Samples, first, count, FLOAT_COMPLEX};
+            require(region.writebuffer(reinterpret_cast<const char*>(compression.block().data()),
+                                       compression.block().samples()),
+                    std::string{compressed_.FileName} + ": cannot be written");
+        });
+        progress_.show(kRangeShare * first / lines);
+    }
+    product_.bufferFile.close();
+    require(compressed_.close(), std::string{compressed_.FileName} + ": cannot be written");
+}
+
+/** Reads what the raster has of a block; beyond its borders there are zeros. */
+void Processor::read_block(AzimuthFocusing& focusing, int first_line, int first_sample) {
+    Block& block = focusing.block();
+    const int top = std::max(0, first_line), left = std::max(0, first_sample);
+    const int bottom = std::min(data_.Lines, first_line + block.lines());
+    const int right = std::min(data_.Samples, first_sample + block.samples());
+    if (bottom - top < block.lines() || right - left < block.samples())
+        std::fill_n(block.data(), block.size(), fcomplex{});
+    BufferIO region{&compressed_, left, right - left, top, bottom - top, FLOAT_COMPLEX};
+    fcomplex* corner = block.line(top - first_line) + (left - first_sample);
+    require(region.readbuffer(reinterpret_cast<char*>(corner), block.samples()),
+            std::string{compressed_.FileName} + ": cannot be read");
+}
+
+/** Writes the image lines of a block. The transforms are cyclic: the image line that would stand before the block
+ * stands at its end. */
+void Processor::write_block(AzimuthFocusing& focusing, DataFile& image, int line, int sample) {
+    Block& block = focusing.block();
+    const int lines = std::min(layout_.step_lines, layout_.lines - line);
+    const int samples = std::min(layout_.step_samples, layout_.samples - sample);
+    for (int done = 0; done < lines;) {
+        const int place = ((done - layout_.lead_lines) % block.lines() + block.lines()) % block.lines();
+        const int count = std::min(lines - done, block.lines() - place);
+        BufferIO region{&image, sample, samples, line + done, count, FLOAT_COMPLEX};
+        require(region.writebuffer(reinterpret_cast<const char*>(block.line(place) + layout_.guard_samples),
+                                   block.samples()),
+                job_.image + ": cannot be written");
+        done += count;
+    }
+}
+
+/** Focuses the blocks of one strip of image lines, from near to far. */
+void Processor::focus_strip(AzimuthFocusing& focusing, DataFile& image, int strip_line) {
+    const int line = layout_.first_line + strip_line;  // counted like raw lines
+    ROI_Obj strip;
+    data_.clone(&strip);
+    strip.SetSlowAxe(data_.SlowStartTime + line * data_.SlowTimeDelta, data_.SlowTimeDelta,
+                     std::min(layout_.step_lines, layout_.lines - strip_line));
+    RangeHistories histories{product_, strip, job_.height_m};
+    for (int sample = 0; sample < layout_.samples; sample += layout_.step_samples) {
+        const int first_sample = sample - layout_.guard_samples;
+        stopwatch_.time(Work::kReading, [&] { read_block(focusing, line + layout_.lead_lines, first_sample); });
+        stopwatch_.time(Work::kTransforms, [&] { focusing.transform(); });
+        stopwatch_.time(Work::kFilters, [&] {
+            focusing.aim(product_, histories, data_.FastStartTime + first_sample * data_.FastTimeDelta,
+                         strip.SlowStartTime + 0.5 * strip.SlowTimeLength);
+            focusing.filter_middle();
+        });
+        stopwatch_.time(Work::kTransforms, [&] { focusing.transform_range(); });
+        stopwatch_.time(Work::kFilters, [&] { focusing.filter_columns(); });
+        stopwatch_.time(Work::kTransforms, [&] { focusing.transform_azimuth(); });
+        stopwatch_.time(Work::kWriting, [&] { write_block(focusing, image, strip_line, sample); });
+        const double strips = (strip_line + layout_.step_lines * static_cast<double>(sample) / layout_.samples);
+        progress_.show(kRangeShare + (1.0 - kRangeShare) * strips / layout_.lines);
+    }
+}
+
+/** Focuses the intermediate raster into the image. */
+void Processor::focus_azimuth() {
+    layout_ = lay_out(product_, conf_, data_, band_, job_.height_m);
+    check_memory(layout_.block_lines, layout_.block_samples);
+    std::optional<AzimuthFocusing> focusing;
+    stopwatch_.time(Work::kPlanning, [&] { focusing.emplace(layout_, band_, data_.FastTimeDelta); });
+    DataFile image;
+    describe(image, job_.image, layout_.lines, layout_.samples);
+    require(image.open(1), job_.image + ": cannot be written");
+    require(compressed_.open(0), std::string{compressed_.FileName} + ": cannot be read");
+    for (int line = 0; line < layout_.lines; line += layout_.step_lines) focus_strip(*focusing, image, line);
+    require(compressed_.close(), std::string{compressed_.FileName} + ": cannot be closed");
+    require(image.close(), job_.image + ": cannot be written");
+    if (processing_.EraseTemp != 0) std::remove(compressed_.FileName);
+}
+
+/** Writes the image's product header: that of the raw data, with what focusing changed. */
+void Processor::write_header() {
+    GeneralSAR& product = product_;
+    product.roi.Roi.SetSlowAxe(data_.SlowStartTime + layout_.first_line * data_.SlowTimeDelta, data_.SlowTimeDelta,
+                               layout_.lines);
+    product.roi.Roi.SetFastAxe(data_.FastStartTime, data_.FastTimeDelta, layout_.samples);
+    product.dataSetInfo.SetImageType(DataSetInfo_Obj::dsAzimuthFocused);
+    product.spectralWindows.AzMatchedFilterCoef = band_.hamming;
+    product.spectralWindows.RgMatchedFilterCoef = static_cast<double>(conf_.RangeWindowHammingParameter);
+    product.spectralWindows.AzLookBandwidth = band_.width_hz;
+    product.spectralWindows.RgLookBandwidth = product.samplingConstants.Brg_hz;
+    require(product.orbit.SVGetGeoCoords(&product.geoCoords, &product.roi), "the image's corners");
+    BufferFile& raster = product.bufferFile;
+    raster.setFilename(job_.image.c_str());
+    raster.setLines(layout_.lines);
+    raster.setSamples(layout_.samples);
+    raster.setRowPrefix(0);
+    raster.setType(FLOAT_COMPLEX);
+    raster.HeaderOffset = 0;
+    raster.ByteOrder = 0;
+
+    product.GSdisable(gsDataFile);  // the same section as the raster's
+    product.GSenable(gsSpectralWindows);
+    product.GSenable(gsGeoCoords);
+    const std::string header = job_.image + ".hdr";
+    std::remove(header.c_str());
+    errno = 0;
+    quorelxml::setExactNumbers(true);
+    product.GSwrite(header.c_str());
+}
+
+FocusResult Processor::run() {
+    read_header();
+    compress_range();
+    focus_azimuth();
+    write_header();
+    progress_.show(1.0);
+    return {layout_.lines, layout_.samples, layout_.block_lines, layout_.block_samples, stopwatch_};
+}
+
+}  // namespace
+
+FocusResult focus(const FocusJob& job, const AzimuthConf& azimuth, const generalProcessingConf& processing) {
+    return Processor{job, azimuth, processing}.run();
+}
+
+}  // namespace example

@@ -1,0 +1,38 @@
+#ifndef QUO_EXAMPLES_STOPWATCH_H
+#define QUO_EXAMPLES_STOPWATCH_H
+
+#include <array>
+#include <chrono>
+#include <cstddef>
+
+namespace example {
+
+/** What the processor's time goes into. */
+enum class Work : std::size_t { kPlanning, kReading, kWriting, kTransforms, kFilters };
+inline constexpr std::size_t kWorks = 5;
+
+/** Adds up the time that each kind of work takes. */
+class Stopwatch {
+public:
+    template <typename Piece>
+    void time(Work work, Piece&& piece) {
+        const auto start = Clock::now();
+        piece();
+        seconds_[static_cast<std::size_t>(work)] += since(start);
+    }
+    [[nodiscard]] double seconds(Work work) const { return seconds_[static_cast<std::size_t>(work)]; }
+    /** Since the object was made. */
+    [[nodiscard]] double total() const { return since(start_); }
+
+private:
+    using Clock = std::chrono::steady_clock;
+    [[nodiscard]] static double since(Clock::time_point start) {
+        return std::chrono::duration<double>(Clock::now() - start).count();
+    }
+    Clock::time_point start_ = Clock::now();
+    std::array<double, kWorks> seconds_{};
+};
+
+}  // namespace example
+
+#endif
