@@ -50,8 +50,7 @@ struct Times {
     [[nodiscard]] double last() const { return at(count - 1); }
 };
 
-/** Gives `orbit` the state vectors of any motion, a function of time that returns a Platform. `zero` is the
- * motion's own time at the first vector. */
+/** Gives `orbit` the state vectors of any motion, a function of time that returns a Platform. */
 template <typename Motion>
 void make_orbit(GeneralSAROrbit& orbit, const Times& times, const Motion& motion) {
     if (orbit.SVCreate(times.first_s, times.spacing_s, times.count)) throw std::runtime_error{"SVCreate"};
@@ -64,6 +63,18 @@ void make_orbit(GeneralSAROrbit& orbit, const Times& times, const Motion& motion
     }
     if (orbit.computeApproximateSV()) throw std::runtime_error{"computeApproximateSV"};
 }
+
+/** A circular orbit, above its place at the time of the first vector: the truth, and the model of it. */
+struct Flight {
+    explicit Flight(const Times& when) : times{when} {
+        make_orbit(orbit, times, [this](double t) { return state(t); });
+    }
+    [[nodiscard]] Platform state(double t) const { return circle.earth_fixed(t - times.first_s); }
+
+    Times times;
+    CircularOrbit circle{41.3, 12.8, -12.7};
+    GeneralSAROrbit orbit;
+};
 
 inline Vec3 position_at(GeneralSAROrbit& orbit, double t) {
     Vec3 p{};

@@ -1,6 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
+#include <functional>
 #include <limits>
 #include <string>
 #include <vector>
@@ -54,44 +56,40 @@ constexpr Sampling kSamplings[] = {
 };
 class Resampled : public testing::TestWithParam<Sampling> {
 protected:
-    [[nodiscard]] test::Platform motion(double t) const {
-        return ellipse_.earth_fixed(t - times_.first_s - 100.0);
-    }
+    Resampled() { test::make_orbit(orbit_, times_, motion_); }
+    [[nodiscard]] Deviation deviation() { return worst(orbit_, times_.first_s, times_.last(), motion_); }
+
     test::Times times_{803457.3, GetParam().spacing_s, GetParam().count};
     test::EllipticOrbit ellipse_{41.3, 12.8, -12.7, GetParam().eccentricity};
+    std::function<test::Platform(double)> motion_ = [this](double t) {
+        return ellipse_.earth_fixed(t - times_.first_s - 100.0);
+    };
+    GeneralSAROrbit orbit_;
 };
 INSTANTIATE_TEST_SUITE_P(Table, Resampled, testing::ValuesIn(kSamplings),
                          [](const auto& row) { return row.param.name; });
 
 TEST_P(Resampled, FollowsTheTrueOrbit) {
-    GeneralSAROrbit orbit;
-    test::make_orbit(orbit, times_, [this](double t) { return motion(t); });
-    ASSERT_EQ(orbit.SVResample(GetParam().new_spacing_s), 0);
-    EXPECT_EQ(orbit.nSV_n, GetParam().new_count);
-    EXPECT_EQ(orbit.t0SV_s, times_.first_s);
-    EXPECT_NEAR(orbit.dtSV_s * (orbit.nSV_n - 1), times_.last() - times_.first_s, 1e-9);
-    const Deviation after = worst(orbit, times_.first_s, times_.last(), [this](double t) { return motion(t); });
-    EXPECT_LT(after.position_m, 1e-3);
-    EXPECT_LT(after.velocity_m_s, 1e-4);
-    for (int i = 0; i < orbit.nSV_n; ++i) {
-        const Vec3 truth = motion(orbit.t0SV_s + i * orbit.dtSV_s).velocity;
-        const double* v = orbit.vSV_mOs + 3 * static_cast<std::ptrdiff_t>(i);
-        EXPECT_LT(test::norm(Vec3{v[0], v[1], v[2]} - truth), 1e-6);
-    }
-}
-
-// The estimate lies within a third of the true error of the model.
-TEST_P(Resampled, ErrorIsEstimatedBefore) {
-    GeneralSAROrbit orbit;
-    test::make_orbit(orbit, times_, [this](double t) { return motion(t); });
-    const double truth =
-        worst(orbit, times_.first_s, times_.last(), [this](double t) { return motion(t); }).position_m;
-    EXPECT_NEAR(orbit.orbitFitError(), truth, truth / 3.0 + 2e-8);
+    // The estimate of the model's own error lies within a third of the truth.
+    const double before = deviation().position_m;
+    EXPECT_NEAR(orbit_.orbitFitError(), before, before / 3.0 + 2e-8);
     if (GetParam().spacing_s == 60.0) {
-        EXPECT_GT(orbit.orbitFitError(), 0.1);
+        EXPECT_GT(orbit_.orbitFitError(), 0.1);
     }
     if (GetParam().spacing_s < 10.0) {
-        EXPECT_LT(orbit.orbitFitError(), 5e-5);
+        EXPECT_LT(orbit_.orbitFitError(), 5e-5);
+    }
+
+    ASSERT_EQ(orbit_.SVResample(GetParam().new_spacing_s), 0);
+    EXPECT_EQ(orbit_.nSV_n, GetParam().new_count);
+    EXPECT_EQ(orbit_.t0SV_s, times_.first_s);
+    EXPECT_NEAR(orbit_.dtSV_s * (orbit_.nSV_n - 1), times_.last() - times_.first_s, 1e-9);
+    EXPECT_LT(deviation().position_m, 1e-3);
+    EXPECT_LT(deviation().velocity_m_s, 1e-4);
+    for (int i = 0; i < orbit_.nSV_n; ++i) {
+        const double* v = orbit_.vSV_mOs + 3 * static_cast<std::ptrdiff_t>(i);
+        const Vec3 truth = motion_(orbit_.t0SV_s + i * orbit_.dtSV_s).velocity;
+        EXPECT_LT(test::norm(Vec3{v[0], v[1], v[2]} - truth), 1e-6);
     }
 }
 
@@ -115,43 +113,33 @@ TEST(OrbitFitError, SeesARoughMiddle) {
 // Velocities that are not the positions' derivative would bend a curve that takes them by 12 cm between two
 // vectors.
 TEST(SVResample, LeavesWrongVelocitiesAside) {
-    const test::CircularOrbit circle{41.3, 12.8, -12.7};
-    const test::Times times{803457.3, 60.0, 12};
-    const auto motion = [&](double t) { return circle.earth_fixed(t - times.first_s); };
-    GeneralSAROrbit orbit;
-    test::make_orbit(orbit, times, [&](double t) {
-        test::Platform state = motion(t);
-        state.velocity = state.velocity + Vec3{0.013, -0.011, 0.008};
-        return state;
-    });
-    ASSERT_EQ(orbit.SVResample(10.0), 0);
-    EXPECT_LT(worst(orbit, times.first_s, times.last(), motion).position_m, 1e-3);
+    test::Flight flight{{803457.3, 60.0, 12}};
+    for (int i = 0; i < 36; ++i) flight.orbit.vSV_mOs[i] += 0.013 - 0.002 * (i % 3);
+    ASSERT_EQ(flight.orbit.SVResample(10.0), 0);
+    const auto motion = [&](double t) { return flight.state(t); };
+    EXPECT_LT(worst(flight.orbit, flight.times.first_s, flight.times.last(), motion).position_m, 1e-3);
 }
 
 TEST(SVResample, WritesWhatItMade) {
-    const test::CircularOrbit circle{41.3, 12.8, -12.7};
     const test::TemporaryFolder folder;
-    GeneralSAROrbit orbit, back;
-    test::make_orbit(orbit, {803457.3, 60.0, 7}, [&](double t) { return circle.earth_fixed(t - 803457.3); });
-    ASSERT_EQ(orbit.SVResample(7.0), 0);
-    ASSERT_EQ(orbit.writehdr(folder.file("orbit.xml").c_str()), 0);
+    test::Flight flight{{803457.3, 60.0, 7}};
+    GeneralSAROrbit back;
+    ASSERT_EQ(flight.orbit.SVResample(7.0), 0);
+    ASSERT_EQ(flight.orbit.writehdr(folder.file("orbit.xml").c_str()), 0);
     ASSERT_EQ(back.readhdr(folder.file("orbit.xml").c_str()), 0);
     ASSERT_EQ(back.nSV_n, 53);
-    for (int i = 0; i < 3 * 53; ++i) EXPECT_NEAR(back.pSV_m[i], orbit.pSV_m[i], 1e-7);
+    for (int i = 0; i < 3 * 53; ++i) EXPECT_NEAR(back.pSV_m[i], flight.orbit.pSV_m[i], 1e-7);
 }
 
 TEST(SVResample, LeavesTheOrbitAsItWasWhenRefused) {
-    const test::CircularOrbit circle{41.3, 12.8, -12.7};
-    GeneralSAROrbit orbit;
-    EXPECT_EQ(orbit.SVResample(10.0), QUO_REFUSED);
-    test::make_orbit(orbit, {803457.3, 9.7, 17}, [&](double t) { return circle.earth_fixed(t - 803457.3); });
+    EXPECT_EQ(GeneralSAROrbit{}.SVResample(10.0), QUO_REFUSED);
+    test::Flight flight{{803457.3, 9.7, 17}};
+    GeneralSAROrbit& orbit = flight.orbit;
     const double* positions = orbit.pSV_m;
     const double x = orbit.SVGetPos(803500.0)[0];
     for (const double bad : {0.0, -1.0, kNaN, std::numeric_limits<double>::infinity(), 1e-9, 1e-300})
         EXPECT_EQ(orbit.SVResample(bad), QUO_REFUSED) << bad;
-    EXPECT_EQ(orbit.pSV_m, positions);
-    EXPECT_EQ(orbit.nSV_n, 17);
-    EXPECT_EQ(orbit.dtSV_s, 9.7);
+    EXPECT_TRUE(orbit.pSV_m == positions && orbit.nSV_n == 17 && orbit.dtSV_s == 9.7);
     EXPECT_EQ(orbit.SVGetPos(803500.0)[0], x);
 }
 
@@ -178,14 +166,12 @@ TEST(SVCheck, IsContentWithRealOrbits) {
 }
 
 TEST_P(Resampled, CheckIsContentWithAnyGoodOrbit) {
-    GeneralSAROrbit orbit;
-    test::make_orbit(orbit, times_, [this](double t) { return motion(t); });
-    EXPECT_EQ(texts(check(orbit)), "");
-    for (int i = 0; i < 3 * orbit.nSV_n; ++i) {  // as text with three decimals would have them
-        orbit.pSV_m[i] = std::round(orbit.pSV_m[i] * 1e3) / 1e3;
-        orbit.vSV_mOs[i] = std::round(orbit.vSV_mOs[i] * 1e4) / 1e4;
+    EXPECT_EQ(texts(check(orbit_)), "");
+    for (int i = 0; i < 3 * orbit_.nSV_n; ++i) {  // as text with three decimals would have them
+        orbit_.pSV_m[i] = std::round(orbit_.pSV_m[i] * 1e3) / 1e3;
+        orbit_.vSV_mOs[i] = std::round(orbit_.vSV_mOs[i] * 1e4) / 1e4;
     }
-    EXPECT_EQ(texts(check(orbit)), "");
+    EXPECT_EQ(texts(check(orbit_)), "");
 }
 
 // A spacing too wide for the model is not the vectors' fault.
@@ -199,105 +185,88 @@ TEST(SVCheck, IsContentWithWideSpacing) {
     }
 }
 
-class OneWrongVector : public testing::TestWithParam<int> {
-protected:
-    OneWrongVector() {
-        test::make_orbit(orbit_, {803457.3, 9.7, 13},
-                         [this](double t) { return circle_.earth_fixed(t - 803457.3); });
-    }
-    [[nodiscard]] std::ptrdiff_t at() const { return 3 * static_cast<std::ptrdiff_t>(GetParam()); }
-    void expect_finding(SVFinding::Problem problem, double size) {
-        const std::vector<SVFinding> findings = check(orbit_);
-        ASSERT_EQ(findings.size(), 1U) << texts(findings);
-        EXPECT_EQ(findings[0].problem, problem) << findings[0].text;
-        EXPECT_EQ(findings[0].index, GetParam());
-        EXPECT_NEAR(findings[0].size, size, 1e-3 + 1e-6 * size);
-        EXPECT_NE(std::string{findings[0].text}.find("state vector " + std::to_string(GetParam()) + ":"),
-                  std::string::npos);
-    }
-    test::CircularOrbit circle_{41.3, 12.8, -12.7};
-    GeneralSAROrbit orbit_;
+/** One way to spoil a vector: its positions, its velocities. */
+struct Spoilt {
+    void (*spoil)(double* position, double* velocity);
+    SVFinding::Problem problem;
+    double size;
 };
-INSTANTIATE_TEST_SUITE_P(At, OneWrongVector, testing::Range(0, 13));
+const Spoilt kSpoilt[] = {
+    {[](auto* p, auto*) { p[1] += 8.5; }, SVFinding::kPositionStep, 8.5},
+    {[](auto*, auto* v) { v[2] -= 0.75; }, SVFinding::kVelocity, 0.75},
+    {[](auto*, auto* v) { v[0] = kNaN; }, SVFinding::kNotFinite, 0.0},
+    {[](auto* p, auto*) { std::fill_n(p, 3, 0.0); }, SVFinding::kInsideEarth, 0.0},
+};
 
-TEST_P(OneWrongVector, PositionIsFound) {
-    orbit_.pSV_m[at() + 1] += 8.5;
-    expect_finding(SVFinding::kPositionStep, 8.5);
-}
-TEST_P(OneWrongVector, VelocityIsFound) {
-    orbit_.vSV_mOs[at() + 2] -= 0.75;
-    expect_finding(SVFinding::kVelocity, 0.75);
-}
-TEST_P(OneWrongVector, NotANumberIsFound) {
-    orbit_.vSV_mOs[at()] = kNaN;
-    expect_finding(SVFinding::kNotFinite, 0.0);
-}
-TEST_P(OneWrongVector, NullPositionIsFound) {
-    std::fill_n(orbit_.pSV_m + at(), 3, 0.0);
-    expect_finding(SVFinding::kInsideEarth, 0.0);
-}
-TEST_P(OneWrongVector, DuplicateIsFound) {
-    const bool first = GetParam() == 0;  // has no predecessor: its successor is the duplicate
-    std::copy_n(orbit_.pSV_m + at() + (first ? 3 : -3), 3, orbit_.pSV_m + at());
-    orbit_.pSV_m[at()] += 3.0;  // near enough
-    const std::vector<SVFinding> findings = check(orbit_);
-    ASSERT_FALSE(findings.empty());
-    EXPECT_EQ(findings.back().problem, SVFinding::kDuplicate);
-    EXPECT_EQ(findings.back().index, first ? 1 : GetParam());
+TEST(SVCheck, FindsOneWrongVector) {
+    for (int index = 0; index < 13; ++index) {
+        const std::ptrdiff_t at = 3 * static_cast<std::ptrdiff_t>(index);
+        for (const Spoilt& row : kSpoilt) {
+            test::Flight flight{{803457.3, 9.7, 13}};
+            row.spoil(flight.orbit.pSV_m + at, flight.orbit.vSV_mOs + at);
+            const std::vector<SVFinding> findings = check(flight.orbit);
+            ASSERT_EQ(findings.size(), 1U) << texts(findings);
+            EXPECT_EQ(findings[0].problem, row.problem) << findings[0].text;
+            EXPECT_EQ(findings[0].index, index);
+            EXPECT_NEAR(findings[0].size, row.size, 1e-3 + 1e-6 * row.size);
+            EXPECT_NE(texts(findings).find("state vector " + std::to_string(index) + ":"), std::string::npos);
+        }
+        const bool first = index == 0;  // has no predecessor: its successor is the duplicate
+        test::Flight flight{{803457.3, 9.7, 13}};
+        double* const p = flight.orbit.pSV_m + at;
+        std::copy_n(p + (first ? 3 : -3), 3, p);
+        p[0] += 3.0;  // near enough
+        const std::vector<SVFinding> findings = check(flight.orbit);
+        ASSERT_FALSE(findings.empty());
+        EXPECT_EQ(findings.back().problem, SVFinding::kDuplicate);
+        EXPECT_EQ(findings.back().index, first ? 1 : index);
+    }
 }
 
 struct AllVelocities {
-    const char* name;
     Vec3 (*velocity)(const test::Platform& state);
     double least_m_s, most_m_s;
 };
 const AllVelocities kAllVelocities[] = {
-    {"Biased",
-     [](const test::Platform& s) {
+    {[](const test::Platform& s) {
          return s.velocity + Vec3{0.012, 0.0, -0.016};
      },
      0.019, 0.021},
-    {"Inertial",
-     [](const test::Platform& s) {
+    {[](const test::Platform& s) {
          return s.velocity + test::cross({0.0, 0.0, test::kEarthRate}, s.position);
      },
-     80.0, 520.0},
-    {"KilometresPerSecond", [](const test::Platform& s) { return 1e-3 * s.velocity; }, 7e3, 8e3},
+     80.0, 520.0},                                                          // inertial
+    {[](const test::Platform& s) { return 1e-3 * s.velocity; }, 7e3, 8e3},  // kilometres per second
 };
-class WrongVelocities : public testing::TestWithParam<AllVelocities> {};
-INSTANTIATE_TEST_SUITE_P(Table, WrongVelocities, testing::ValuesIn(kAllVelocities),
-                         [](const auto& row) { return row.param.name; });
 
-TEST_P(WrongVelocities, AreFoundAndMeasured) {
-    const test::CircularOrbit circle{41.3, 12.8, -12.7};
-    for (const double spacing : {9.7, 60.0}) {
-        GeneralSAROrbit orbit;
-        test::make_orbit(orbit, {803457.3, spacing, 13}, [&](double t) {
-            test::Platform state = circle.earth_fixed(t - 803457.3);
-            state.velocity = GetParam().velocity(state);
-            return state;
-        });
-        const std::vector<SVFinding> findings = check(orbit);
-        EXPECT_EQ(findings.size(), 13U);
-        for (const SVFinding& finding : findings) {
-            EXPECT_EQ(finding.problem, SVFinding::kVelocity) << finding.text;
-            EXPECT_GT(finding.size, GetParam().least_m_s);
-            EXPECT_LT(finding.size, GetParam().most_m_s);
+TEST(SVCheck, FindsAndMeasuresWrongVelocities) {
+    for (const AllVelocities& row : kAllVelocities)
+        for (const double spacing : {9.7, 60.0}) {
+            const test::CircularOrbit circle{41.3, 12.8, -12.7};
+            GeneralSAROrbit orbit;
+            test::make_orbit(orbit, {803457.3, spacing, 13}, [&](double t) {
+                test::Platform state = circle.earth_fixed(t - 803457.3);
+                state.velocity = row.velocity(state);
+                return state;
+            });
+            const std::vector<SVFinding> findings = check(orbit);
+            EXPECT_EQ(findings.size(), 13U);
+            for (const SVFinding& finding : findings) {
+                EXPECT_EQ(finding.problem, SVFinding::kVelocity) << finding.text;
+                EXPECT_TRUE(finding.size > row.least_m_s && finding.size < row.most_m_s) << finding.size;
+            }
         }
-    }
 }
 
 TEST(SVCheck, FindsWhatIsWrongWithTheList) {
-    const test::CircularOrbit circle{41.3, 12.8, -12.7};
-    GeneralSAROrbit orbit;
-    EXPECT_EQ(texts(check(orbit)),
+    EXPECT_EQ(texts(check(GeneralSAROrbit{})),
               "state vectors: fewer than five 0 vectors\n"
               "state vectors: the times are not finite or do not increase; spacing -999 s\n");
-    test::make_orbit(orbit, {803457.3, 9.7, 13}, [&](double t) { return circle.earth_fixed(t - 803457.3); });
-    orbit.dtSV_s = 9.71;  // as wrong as every velocity: a thousandth
-    EXPECT_GE(check(orbit).size(), 9U);
-    orbit.dtSV_s = kNaN;
-    const std::vector<SVFinding> findings = check(orbit);
+    test::Flight flight{{803457.3, 9.7, 13}};
+    flight.orbit.dtSV_s = 9.71;  // as wrong as every velocity: a thousandth
+    EXPECT_GE(check(flight.orbit).size(), 9U);
+    flight.orbit.dtSV_s = kNaN;
+    const std::vector<SVFinding> findings = check(flight.orbit);
     ASSERT_EQ(findings.size(), 1U);
     EXPECT_EQ(findings[0].problem, SVFinding::kTimes);
     EXPECT_EQ(findings[0].index, -1);
