@@ -25,6 +25,8 @@ void add_vrt(CLI::App& app, Job& job);
 void add_derive(CLI::App& app, Job& job);
 void add_fit(CLI::App& app, Job& job);
 void add_coregister(CLI::App& app, Job& job);
+void add_config(CLI::App& app, Job& job);
+void add_debug_dump(CLI::App& app, Job& job);
 
 }  // namespace tool
 

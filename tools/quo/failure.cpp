@@ -31,11 +31,14 @@ std::string status_text(int status) {
     return known == std::end(kMeanings) ? number : number + " (" + known->text + ")";
 }
 
-void complain(const std::string& message) {
-    std::string line = "quo: " + message;
+std::string one_line(std::string text) {
     std::replace_if(
-        line.begin(), line.end(), [](unsigned char c) { return c < ' ' || c == 0x7F; }, ' ');
-    line += '\n';
+        text.begin(), text.end(), [](unsigned char c) { return c < ' ' || c == 0x7F; }, ' ');
+    return text;
+}
+
+void complain(const std::string& message) {
+    const std::string line = one_line("quo: " + message) + '\n';
     std::fwrite(line.data(), 1, line.size(), stderr);
 }
 

@@ -29,8 +29,10 @@ std::string system_cause();
 /** What a status code of the library means, such as "12 (not seen from this orbit)". */
 std::string status_text(int status);
 
-/** Writes "quo: message" as one line to standard error; line feeds and other control characters in the message,
- * which may quote a file, become blanks. */
+/** A text that may quote a file, fit for one line: line feeds and other control characters become blanks. */
+std::string one_line(std::string text);
+
+/** Writes "quo: message" as one line to standard error. */
 void complain(const std::string& message);
 
 }  // namespace tool

@@ -21,7 +21,7 @@ namespace {
 struct GeolocateOptions {
     std::string header, direction, input = "-", output = "-", look;
     std::optional<double> wavelength_m, resample_s;
-    bool precise = false;
+    bool precise = false, waitbar = false;
 };
 
 constexpr std::size_t kInputs = 4;  // at most, the Doppler included
@@ -193,7 +193,7 @@ int geolocate_table(Scene& scene, const GeolocateOptions& options, const Directi
     RowMessages messages;
     std::int64_t rows = 0;
     {
-        Progress progress;
+        Progress progress{Progress::Unit::kRows, options.waitbar ? "Geolocating" : nullptr};
         std::string line;
         while (table.next()) {
             line.clear();
@@ -258,6 +258,7 @@ void add_geolocate(CLI::App& app, Job& job) {
     command->add_option("--look", options->look, "Look side, instead of the header's")
         ->check(CLI::IsMember({"right", "left"}));
     command->add_option("--resample", options->resample_s, "State vectors at most so many seconds apart");
+    add_waitbar_option(*command, options->waitbar);
     command->callback([options, &job] { job = [options] { return geolocate(*options); }; });
 }
 

@@ -34,6 +34,8 @@ int run(int argc, char** argv) {
     tool::add_derive(app, job);
     tool::add_fit(app, job);
     tool::add_coregister(app, job);
+    tool::add_config(app, job);
+    tool::add_debug_dump(app, job);
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {

@@ -5,16 +5,25 @@
 #include <cstdint>
 #include <string>
 
+namespace CLI {
+class App;
+}
+
 namespace tool {
 
+/** Declares the option --waitbar of a long-running subcommand. */
+void add_waitbar_option(CLI::App& command, bool& waitbar);
+
 /** A bar on standard error for jobs that somebody waits for: it shows itself only on a terminal and only when the
- * job takes longer than half a second, and is wiped away at the end. */
+ * job takes longer than half a second, and is wiped away at the end. With a waitbar title it leaves the drawing to
+ * the parent process instead, whom it tells the share that is done, line by line (quo_base/debugIO.h). */
 class Progress {
 public:
     /** What is counted. */
     enum class Unit { kRows, kBytes };
 
-    explicit Progress(Unit unit = Unit::kRows);
+    /** @param waitbar_title  null: no waitbar */
+    explicit Progress(Unit unit = Unit::kRows, const char* waitbar_title = nullptr);
     ~Progress();
     Progress(const Progress&) = delete;
     Progress& operator=(const Progress&) = delete;
@@ -30,8 +39,10 @@ private:
     using Clock = std::chrono::steady_clock;
 
     void draw(const std::string& text);
+    void tell(double share);
 
-    bool terminal_;
+    bool waitbar_, terminal_;
+    double told_ = -1.0;
     Unit unit_;
     bool visible_ = false;
     unsigned calls_ = 0;

@@ -1,0 +1,357 @@
+#include <algorithm>
+#include <charconv>
+#include <cstdint>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <memory>
+#include <nlohmann/json.hpp>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "commands.h"
+#include "failure.h"
+#include "number.h"
+#include "output.h"
+#include "quo_base/generalSAR_configuration.h"
+
+namespace tool {
+namespace {
+
+using Record = GeneralSAR_ConfigurationRecord;
+using Json = nlohmann::ordered_json;
+
+constexpr int kChannel = 1;
+constexpr const char* kShared = "generalProcessingConf";
+constexpr double kNoBound = 1e30;  // bounds of this size and above stand for none
+
+struct ConfigOptions {
+    std::vector<std::string> records;
+    std::string file;
+    bool json = false, replace = false;
+};
+
+// --- parameters -------------------------------------------------------------------------------------------------
+
+/** One parameter: of a record, or of those that all processors share. */
+struct Parameter {
+    parElement element;
+    const char *unit, *meaning;
+};
+
+std::vector<Parameter> parameters_of(const Record& record) {
+    std::vector<Parameter> parameters;
+    for (int i = 0; i < record.elementCount(); ++i)
+        parameters.push_back({*record.element(i), record.unit(i), record.meaning(i)});
+    return parameters;
+}
+
+std::vector<Parameter> shared_parameters(GeneralSAR_BaseConfiguration& configuration) {
+    std::vector<Parameter> parameters;
+    for (int i = 0; i < GeneralSAR_BaseConfiguration::kSharedParameters; ++i)
+        parameters.push_back({configuration.sharedParameter(i), GeneralSAR_BaseConfiguration::sharedUnit(i),
+                              GeneralSAR_BaseConfiguration::sharedMeaning(i)});
+    return parameters;
+}
+
+std::unique_ptr<Record> record_of(const std::string& name) {
+    auto record = Record::make(name);
+    if (record) return record;
+    std::string known;
+    for (const char* other : Record::names()) known += (known.empty() ? "" : ", ") + std::string{other};
+    throw WrongUse(name + ": no record; there are " + known);
+}
+
+/** A float as it is written by hand: 0.8, not 0.800000011920929. */
+double plain(float value) {
+    char room[32];
+    const auto [end, error] = std::to_chars(std::begin(room), std::end(room), value);
+    return error == std::errc{} ? finite_number({room, end}).value_or(static_cast<double>(value))
+                                : static_cast<double>(value);
+}
+
+Json value_at(const parElement& element, int i) {
+    switch (element.type) {
+        case parElement::typeDouble:
+            return static_cast<const double*>(element.pointer)[i];
+        case parElement::typeFloat:
+            return plain(static_cast<const float*>(element.pointer)[i]);
+        case parElement::typeInt:
+            return static_cast<const std::int32_t*>(element.pointer)[i];
+        case parElement::typeString:
+            return static_cast<const char*>(element.pointer);
+        case parElement::typeNone:
+            break;
+    }
+    return nullptr;
+}
+
+Json values_of(const parElement& element) {
+    if (element.count == 1) return value_at(element, 0);
+    Json values = Json::array();
+    for (int i = 0; i < element.count; ++i) values.push_back(value_at(element, i));
+    return values;
+}
+
+std::string text_of(const Json& value) {
+    if (value.is_string()) return one_line(value.get<std::string>());
+    if (value.is_number_float()) return exact(value.get<double>());
+    if (!value.is_array()) return value.dump();
+    std::string text;
+    for (const Json& part : value) text += (text.empty() ? "" : " ") + text_of(part);
+    return text;
+}
+
+std::string print(const Json& json) {
+    return json.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n";
+}
+
+void put_out(const std::string& text) {
+    Output output{"-"};
+    output.write(text);
+    output.commit();
+}
+
+// --- doc --------------------------------------------------------------------------------------------------------
+
+std::string type_of(const parElement& element) {
+    constexpr const char* kNames[] = {"double", "float", "int", "text", "-"};
+    const std::string name = kNames[element.type];
+    return element.count == 1 ? name : name + " x " + std::to_string(element.count);
+}
+
+std::string bounds_of(const parElement& element) {
+    const bool below = element.minimum > -kNoBound, above = element.maximum < kNoBound;
+    if (element.minimum == 0.0 && element.maximum == 0.0) return "";
+    if (element.type == parElement::typeInt && element.maximum == 2147483647.0)
+        return "from " + exact(element.minimum);
+    if (below && above) return exact(element.minimum) + " to " + exact(element.maximum);
+    return below ? "from " + exact(element.minimum) : "";
+}
+
+/** A table in Markdown whose columns also line up on a terminal. */
+class MarkdownTable {
+public:
+    using Row = std::vector<std::string>;
+    explicit MarkdownTable(Row heading) : rows_{std::move(heading)} {}
+    void add(Row row) { rows_.push_back(std::move(row)); }
+
+    [[nodiscard]] std::string text() const {
+        std::vector<std::size_t> widths(rows_[0].size(), 3);
+        for (const Row& row : rows_)
+            for (std::size_t i = 0; i < row.size(); ++i) widths[i] = std::max(widths[i], row[i].size());
+        std::string text = line(rows_[0], widths), rule = "|";
+        for (const std::size_t width : widths) rule += std::string(width + 2, '-') + "|";
+        text += rule + "\n";
+        for (std::size_t i = 1; i < rows_.size(); ++i) text += line(rows_[i], widths);
+        return text;
+    }
+
+private:
+    static std::string line(const Row& row, const std::vector<std::size_t>& widths) {
+        std::string text = "|";
+        for (std::size_t i = 0; i < row.size(); ++i)
+            text += " " + row[i] + std::string(widths[i] - row[i].size(), ' ') + " |";
+        return text + "\n";
+    }
+    std::vector<Row> rows_;
+};
+
+std::string described(const std::string& heading, const std::vector<Parameter>& parameters) {
+    MarkdownTable table{{"parameter", "type", "unit", "bounds", "default", "meaning"}};
+    for (const auto& [element, unit, meaning] : parameters)
+        table.add(
+            {element.name, type_of(element), unit, bounds_of(element), text_of(values_of(element)), meaning});
+    return "### " + heading + "\n\n" + table.text();
+}
+
+int document(const std::vector<std::string>& names) {
+    std::string text;
+    for (const std::string& name : names) {
+        text += (text.empty() ? "" : "\n") + described(name, parameters_of(*record_of(name)));
+    }
+    if (names.empty()) {
+        GeneralSAR_BaseConfiguration shared;
+        text = described("Shared by all records", shared_parameters(shared));
+        for (const char* name : Record::names()) text += "\n" + described(name, parameters_of(*record_of(name)));
+    }
+    put_out(text);
+    return kFine;
+}
+
+// --- new --------------------------------------------------------------------------------------------------------
+
+/** A file in the folder of temporary files that goes with the object. */
+class ScratchFile {
+public:
+    ScratchFile() {
+        const auto pattern = std::filesystem::temp_directory_path() / "quo_config_XXXXXX";
+        folder_ = pattern.string();
+        if (!mkdtemp(folder_.data())) throw Failure(folder_ + ": " + system_cause());
+    }
+    ~ScratchFile() {
+        std::error_code ignored;
+        std::filesystem::remove_all(folder_, ignored);
+    }
+    ScratchFile(const ScratchFile&) = delete;
+    ScratchFile& operator=(const ScratchFile&) = delete;
+
+    [[nodiscard]] std::string name() const { return folder_ + "/configuration.xml"; }
+    [[nodiscard]] std::string text() const {
+        std::ifstream stream{name(), std::ios::binary};
+        return {std::istreambuf_iterator<char>{stream}, {}};
+    }
+
+private:
+    std::string folder_;
+};
+
+ConfigurationReview review_of(const std::string& file) {
+    std::error_code error;
+    const auto kind = std::filesystem::status(file, error).type();
+    if (kind == std::filesystem::file_type::not_found) throw Failure(file + ": no such file");
+    if (kind != std::filesystem::file_type::regular) throw Failure(file + ": not a regular file");
+    ConfigurationReview review;
+    const int status = reviewConfiguration(file.c_str(), kChannel, review);
+    if (status == QUO_REFUSED) throw Failure(file + ": is no configuration file");
+    if (status != QUO_OK) throw Failure(file + ": status " + status_text(status));
+    return review;
+}
+
+bool names_section(const ConfigurationReview& review, const std::string& name) {
+    return std::ranges::find(review.records, name) != review.records.end();
+}
+
+void keep_what_is_there(const ConfigOptions& options, const ScratchFile& scratch) {
+    if (!std::filesystem::exists(options.file)) return;
+    const ConfigurationReview review = review_of(options.file);
+    for (const std::string& name : options.records) {
+        if (names_section(review, name) && !options.replace)
+            throw Failure(options.file + ": has a record " + name + " (--replace writes its defaults)");
+    }
+    std::filesystem::copy_file(options.file, scratch.name());
+}
+
+int write_new(const ConfigOptions& options) {
+    std::vector<std::unique_ptr<Record>> records;
+    for (const std::string& name : options.records) records.push_back(record_of(name));
+    const ScratchFile scratch;
+    if (options.file != "-") keep_what_is_there(options, scratch);
+    for (const auto& record : records) record->writepar(scratch.name().c_str(), kChannel);
+    Output output{options.file};
+    output.write(scratch.text());
+    output.commit();
+    return kFine;
+}
+
+// --- show and check ---------------------------------------------------------------------------------------------
+
+/** What a file says, section by section, with what differs from the defaults. */
+class Listing {
+public:
+    void add(const std::string& section, const std::vector<Parameter>& values,
+             const std::vector<Parameter>& defaults) {
+        text_ += (text_.empty() ? "[" : "\n[") + section + "]\n";
+        for (std::size_t i = 0; i < values.size(); ++i) add_value(section, values[i], defaults[i].element);
+    }
+    [[nodiscard]] std::string text() const { return text_; }
+    [[nodiscard]] const Json& json() const { return json_; }
+
+private:
+    void add_value(const std::string& section, const Parameter& parameter, const parElement& fresh) {
+        constexpr std::size_t kColumn = 32;
+        const Json value = values_of(parameter.element), usual = values_of(fresh);
+        const std::string name = parameter.element.name;
+        json_[section][name] = value;
+        text_ += name + std::string(kColumn - std::min(kColumn - 1, name.size()), ' ') + text_of(value);
+        if (*parameter.unit != '\0') text_ += std::string{" "} + parameter.unit;
+        if (value != usual) text_ += "  (default " + text_of(usual) + ")";
+        text_ += '\n';
+    }
+
+    std::string text_;
+    Json json_ = Json::object();
+};
+
+int show(const ConfigOptions& options) {
+    const ConfigurationReview review = review_of(options.file);
+    if (review.records.empty()) throw Failure(options.file + ": holds no record");
+    Listing listing;
+    GeneralSAR_BaseConfiguration shared, fresh_shared;
+    shared.readConf(options.file.c_str(), kChannel, kShared);
+    listing.add("shared", shared_parameters(shared), shared_parameters(fresh_shared));
+    int status = kFine;
+    for (const std::string& name : review.records) {
+        const auto record = record_of(name), fresh = record_of(name);
+        try {
+            record->readpar(options.file.c_str(), kChannel);
+            listing.add(name, parameters_of(*record), parameters_of(*fresh));
+        } catch (const quorelException&) {
+            complain(options.file + ": " + name + " is incomplete; quo config check tells what is missing");
+            status = kFindings;
+        }
+    }
+    put_out(options.json ? print(listing.json()) : listing.text());
+    return status;
+}
+
+int check(const ConfigOptions& options) {
+    const ConfigurationReview review = review_of(options.file);
+    if (review.records.empty() && review.findings.empty()) throw Failure(options.file + ": holds no record");
+    Json list = Json::array();
+    std::string text;
+    for (const auto& [section, name, reason] : review.findings) {
+        list.push_back({{"section", section}, {"name", name}, {"reason", reason}});
+        text += one_line(section + (name.empty() ? "" : "/") + name + "  " + reason) + "\n";
+    }
+    text += std::to_string(review.findings.size()) + (review.findings.size() == 1 ? " error in " : " errors in ") +
+            std::to_string(review.records.size()) + (review.records.size() == 1 ? " record\n" : " records\n");
+    put_out(options.json ? print(list) : text);
+    return review.findings.empty() ? kFine : kFindings;
+}
+
+// quorelException is no std::exception: nothing above main() would know it.
+Job guarded(int (*verb)(const ConfigOptions&), std::shared_ptr<ConfigOptions> options) {
+    return [verb, options = std::move(options)] {
+        try {
+            return verb(*options);
+        } catch (const quorelException& failure) {
+            throw Failure(options->file + ": " + failure.what());
+        }
+    };
+}
+
+}  // namespace
+
+void add_config(CLI::App& app, Job& job) {
+    CLI::App* config =
+        app.add_subcommand("config", "Writes, shows and checks the processors' configuration files");
+    config->require_subcommand(1);
+    auto options = std::make_shared<ConfigOptions>();
+    const auto add = [&](const char* name, const char* about, int (*verb)(const ConfigOptions&)) {
+        CLI::App* command = config->add_subcommand(name, about);
+        command->callback([options, verb, &job] { job = guarded(verb, options); });
+        return command;
+    };
+
+    CLI::App* command = add("new", "Writes records with their defaults", write_new);
+    command->add_option("RECORD", options->records, "Records, such as AzimuthConf")->required();
+    command->add_option("-o,--output", options->file, "File to write or to add to, - for standard output")
+        ->required();
+    command->add_flag("--replace", options->replace, "Write records anew that FILE has already");
+
+    command = add("show", "Prints the values of a file and what differs from the defaults", show);
+    command->add_option("FILE", options->file, "Configuration file")->required();
+    command->add_flag("--json", options->json, "Print JSON");
+
+    command = add("check", "Lists what in a file does not fit the records", check);
+    command->add_option("FILE", options->file, "Configuration file")->required();
+    command->add_flag("--json", options->json, "Print JSON");
+
+    command = add("doc", "Prints every parameter: type, unit, bounds, default, meaning",
+                  [](const ConfigOptions& chosen) { return document(chosen.records); });
+    command->add_option("RECORD", options->records, "Records to describe; all where none is named");
+}
+
+}  // namespace tool
