@@ -7,7 +7,6 @@
 #include <ctime>
 #include <functional>
 #include <string>
-#include <utility>
 
 #include "quo_base/ckerr.h"
 #include "support/diagnostics.h"
@@ -96,17 +95,11 @@ TEST_P(ReportOpening, AnswersAndOpensAsItsLevelSays) {
     EXPECT_EQ(std::filesystem::exists(name) + std::filesystem::exists(log_name), opens ? 2 : 0);
     EXPECT_EQ(quo_add_log("x"), opens ? 0 : EOF);
 }
-constexpr Opening kOpenings[] = {{true, 1, 0},
-                                 {true, 2, 0},
-                                 {true, 3, 0},
-                                 {true, 0, -1},
-                                 {true, 4, 3},
-                                 {true, -7, -8},
-                                 {false, 1, 0},
-                                 {false, 4, 0},
-                                 {true, INT_MIN, INT_MIN},
-                                 {true, INT_MAX, INT_MAX - 1}};
-INSTANTIATE_TEST_SUITE_P(Levels, ReportOpening, testing::ValuesIn(kOpenings));
+INSTANTIATE_TEST_SUITE_P(Levels, ReportOpening,
+                         testing::Values(Opening{true, 1, 0}, Opening{true, 2, 0}, Opening{true, 3, 0},
+                                         Opening{true, 0, -1}, Opening{true, 4, 3}, Opening{true, -7, -8},
+                                         Opening{true, INT_MIN, INT_MIN}, Opening{true, INT_MAX, INT_MAX - 1},
+                                         Opening{false, 1, 0}, Opening{false, 4, 0}));
 
 TEST_F(ReportFile, StaysAsItIsWhenOpenedAgain) {
     init_report(name.c_str(), "first", 2);
@@ -142,24 +135,19 @@ TEST_F(ReportFile, BoundsALongTitleTheSameWayInBothBanners) {
 
 // ---- Entries
 
-constexpr std::pair<int, const char*> kShortKinds[] = {{1, "WARNING"},
-                                                       {2, "CHECKPOINT"},
-                                                       {4, "CORRECT_FUNCTION_CALL"},
-                                                       {5, "CORRECT_SYSTEM_CALL"},
-                                                       {6, "MESSAGE"},
-                                                       {22, "EXCEPTION"},
-                                                       {7, "UNKNOWN"},
-                                                       {15, "UNKNOWN"},
-                                                       {21, "UNKNOWN"},
-                                                       {23, "UNKNOWN"},
-                                                       {-1, "UNKNOWN"},
-                                                       {INT_MIN, "UNKNOWN"}};
+struct Kind {
+    int code;
+    const char* name;
+};
 
 TEST_F(ReportFile, WritesEveryShortKindInTwoLines) {
     init_report(name.c_str(), "t", 3);
     std::string expected;
     test::CapturedStderr echo;
-    for (const auto& [code, kind] : kShortKinds) {
+    for (const auto& [code, kind] : {Kind{1, "WARNING"}, Kind{2, "CHECKPOINT"}, Kind{4, "CORRECT_FUNCTION_CALL"},
+                                     Kind{5, "CORRECT_SYSTEM_CALL"}, Kind{6, "MESSAGE"}, Kind{22, "EXCEPTION"},
+                                     Kind{7, "UNKNOWN"}, Kind{15, "UNKNOWN"}, Kind{21, "UNKNOWN"},
+                                     Kind{23, "UNKNOWN"}, Kind{-1, "UNKNOWN"}, Kind{INT_MIN, "UNKNOWN"}}) {
         const auto number = (now_s - kLaunch_s) / 13;
         now_s += 13;
         quo_add_report("half 50% done", code, 217, "DataFile::seek", "datafile.cpp");

@@ -60,17 +60,16 @@ TEST_F(Tracked, CallocClearsWhatWasUsedBefore) {
 }
 
 TEST_F(Tracked, SizesThatCannotBeHadGiveNull) {
-    const std::pair<std::size_t, std::size_t> requests[] = {{overflowing, 1},
-                                                            {overflowing - 14, 1},
-                                                            {1, overflowing},
-                                                            {overflowing, overflowing},
-                                                            {std::size_t{1} << 32, std::size_t{1} << 32},
-                                                            {beyond_memory, 1},
-                                                            {1, beyond_memory},
-                                                            {1, overflowing - 15}};
+    struct Request {
+        std::size_t count, size;
+    };
+    constexpr std::size_t kHalf = std::size_t{1} << 32;
     for (const bool tracking : {true, false}) {
         if (!tracking) exit_ckerr();
-        for (const auto& [count, size] : requests) {
+        for (const auto& [count, size] :
+             {Request{overflowing, 1}, Request{overflowing - 14, 1}, Request{1, overflowing},
+              Request{overflowing, overflowing}, Request{kHalf, kHalf}, Request{beyond_memory, 1},
+              Request{1, beyond_memory}, Request{1, overflowing - 15}}) {
             errno = 0;
             EXPECT_EQ(calloc_ckerr(count, size), nullptr) << count << " x " << size;
             EXPECT_EQ(std::exchange(errno, 0), ENOMEM);

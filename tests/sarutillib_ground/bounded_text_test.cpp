@@ -2,7 +2,6 @@
 
 #include <gtest/gtest.h>
 
-#include <array>
 #include <cerrno>
 #include <string>
 
@@ -22,32 +21,26 @@ TEST(CopyBounded, CutsBetweenCharactersAtEveryRoom) {
     const std::string text = "m\u00b2 \u20ac\U0001F6F0 W\u00fcste";
     for (std::size_t room = 0; room <= text.size() + 2; ++room) {
         SCOPED_TRACE(room);
-        std::array<char, 40> to;
-        to.fill(kUntouched);
-        const std::size_t length = quo::copy_bounded(to.data(), room, text);
-        EXPECT_EQ(std::string(to.data() + room, to.size() - room), std::string(to.size() - room, kUntouched));
-        if (room == 0) continue;
-        EXPECT_STREQ(to.data(), whole_characters(text, room - 1).c_str());
-        EXPECT_EQ(length, std::string{to.data()}.size());
-
-        std::array<char, 40> formatted;
-        formatted.fill(kUntouched);
-        EXPECT_EQ(quo::format_bounded(formatted.data(), room, "%s", text.c_str()), length);
-        EXPECT_STREQ(formatted.data(), to.data());
-        EXPECT_EQ(formatted[room], kUntouched);
+        const std::string kept = room == 0 ? "" : whole_characters(text, room - 1);
+        const std::string end = room == 0 ? "" : std::string(1, '\0');
+        for (const bool formats : {false, true}) {
+            std::string to(40, kUntouched);
+            EXPECT_EQ(formats ? quo::format_bounded(to.data(), room, "%s", text.c_str())
+                              : quo::copy_bounded(to.data(), room, text),
+                      kept.size());
+            EXPECT_EQ(to.substr(0, kept.size() + end.size()), kept + end);
+            EXPECT_EQ(to.substr(room), std::string(40 - room, kUntouched));
+        }
     }
 }
 
-TEST(CopyBounded, KeepsBytesThatAreNoUtf8) {
+TEST(CopyBounded, TakesBytesThatAreNoUtf8AndATextInsideItsTarget) {
     char to[6];
     EXPECT_EQ(quo::copy_bounded(to, "\x80\x81\x82\x83\x84\x85\x86"), 5U);
     EXPECT_STREQ(to, "\x80\x81\x82\x83\x84");
-}
-
-TEST(CopyBounded, TakesATextThatLiesInsideItsTarget) {
-    char to[] = "range_time";
-    quo::copy_bounded(to, std::string_view{to + 2, 8});
-    EXPECT_STREQ(to, "nge_time");
+    char inside[] = "range_time";
+    quo::copy_bounded(inside, std::string_view{inside + 2, 8});
+    EXPECT_STREQ(inside, "nge_time");
 }
 
 TEST(FormatBounded, LeavesErrnoAlone) {

@@ -66,11 +66,9 @@ TEST(ByteOrder, WritesNumbersInBothOrders) {
 TEST(ByteOrderDeathTest, EndsTheProcessOnAnyOtherCode) {
     unsigned char bytes[8] = {};
     const auto dies = [](auto call) {
-        const auto watched = [&] {
-            dup2(STDERR_FILENO, STDOUT_FILENO);  // the message goes to the standard output
-            call();
-        };
-        EXPECT_EXIT(watched(), testing::ExitedWithCode(1), "^\norder must be 'm' or 'l'!\n$");
+        // The message goes to the standard output.
+        EXPECT_EXIT((dup2(STDERR_FILENO, STDOUT_FILENO), call()), testing::ExitedWithCode(1),
+                    "^\norder must be 'm' or 'l'!\n$");
     };
     dies([&] { ch2uint2(bytes, 'b'); });
     dies([&] { ch2int4(bytes, 'M'); });
@@ -132,42 +130,35 @@ TEST(GetEndian, SwapsByElementSize) {
     }
 }
 
-/** Bit patterns of one class each. */
-template <typename Bits>
-struct Patterns {
-    std::vector<Bits> finite, infinite, not_a_number;
-};
-
-template <typename Number, typename Bits, typename Test>
-void expect_class(const Patterns<Bits>& patterns, Test is_finite, Test is_infinite, Test is_not_a_number) {
-    const auto expect = [&](const std::vector<Bits>& class_bits, int finite, int infinite, int not_a_number) {
-        for (const Bits bits : class_bits) {
-            SCOPED_TRACE(testing::Message() << std::hex << bits);
-            EXPECT_EQ(is_finite(std::bit_cast<Number>(bits)), finite);
-            EXPECT_EQ(is_infinite(std::bit_cast<Number>(bits)), infinite);
-            EXPECT_EQ(is_not_a_number(std::bit_cast<Number>(bits)), not_a_number);
-        }
-    };
-    expect(patterns.finite, 1, 0, 0);
-    expect(patterns.infinite, 0, 1, 0);
-    expect(patterns.not_a_number, 0, 0, 1);
-}
+/** The class that a number is given: f, i or n for finite, infinite or not-a-number; else none or several. */
+char class_of(double x) { return "?fi?n???"[myfinite(x) + 2 * myisinf(x) + 4 * myisnan(x)]; }
+char class_of(float x) { return "?fi?n???"[myfinite4(x) + 2 * myisinf4(x) + 4 * myisnan4(x)]; }
 
 TEST(NumberClass, OfADoubleLooksAtTheHighWordOnly) {
-    const Patterns<std::uint64_t> patterns{
-        {0, 1, 0x400921FB54442D18, 0x7FEFFFFFFFFFFFFF, 0xFFEFFFFFFFFFFFFF},
-        {0x7FF0000000000000, 0xFFF0000000000000, 0x7FF0000000000001,
-         0xFFF00000FFFFFFFF},  // the last two deliberately
-        {0x7FF8000000000000, 0xFFF8000000000000, 0x7FF0000100000000, 0x7FFFFFFFFFFFFFFF}};
-    expect_class<double>(patterns, myfinite, myisinf, myisnan);
+    struct Pattern {
+        std::uint64_t bits;
+        char number_class;
+    };
+    for (const auto [bits, number_class] :
+         {Pattern{0, 'f'}, Pattern{1, 'f'}, Pattern{0x400921FB54442D18, 'f'}, Pattern{0x7FEFFFFFFFFFFFFF, 'f'},
+          Pattern{0xFFEFFFFFFFFFFFFF, 'f'}, Pattern{0x7FF0000000000000, 'i'}, Pattern{0xFFF0000000000000, 'i'},
+          // Deliberate: these two are no numbers, but their high words say infinity.
+          Pattern{0x7FF0000000000001, 'i'}, Pattern{0xFFF00000FFFFFFFF, 'i'}, Pattern{0x7FF8000000000000, 'n'},
+          Pattern{0xFFF8000000000000, 'n'}, Pattern{0x7FF0000100000000, 'n'}, Pattern{0x7FFFFFFFFFFFFFFF, 'n'}})
+        EXPECT_EQ(class_of(std::bit_cast<double>(bits)), number_class) << std::hex << bits;
 }
 
 TEST(NumberClass, OfAFloatTakesTheLargestForInfinite) {
-    const Patterns<std::uint32_t> patterns{
-        {0, 0x80000001, 0x40490FDB, 0x7F7FFFFE, 0xFF7FFFFE},
-        {0x7F800000, 0xFF800000, 0x7F7FFFFF, 0xFF7FFFFF},  // the last two deliberately
-        {0x7F800001, 0xFFC00000, 0x7FFFFFFF}};
-    expect_class<float>(patterns, myfinite4, myisinf4, myisnan4);
+    struct Pattern {
+        std::uint32_t bits;
+        char number_class;
+    };
+    for (const auto [bits, number_class] :
+         {Pattern{0, 'f'}, Pattern{0x80000001, 'f'}, Pattern{0x40490FDB, 'f'}, Pattern{0x7F7FFFFE, 'f'},
+          Pattern{0xFF7FFFFE, 'f'}, Pattern{0x7F800000, 'i'}, Pattern{0xFF800000, 'i'}, Pattern{0x7F7FFFFF, 'i'},
+          Pattern{0xFF7FFFFF, 'i'},  // deliberate
+          Pattern{0x7F800001, 'n'}, Pattern{0xFFC00000, 'n'}, Pattern{0x7FFFFFFF, 'n'}})
+        EXPECT_EQ(class_of(std::bit_cast<float>(bits)), number_class) << std::hex << bits;
 }
 
 }  // namespace

@@ -3,10 +3,13 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <cstdint>
 #include <cstdio>
 #include <filesystem>
-#include <limits>
+#include <fstream>
+#include <iomanip>
 #include <string>
+#include <utility>
 
 #include "quo_base/gen_utils.h"
 #include "sarutillib/file_io.h"
@@ -27,10 +30,7 @@ protected:
         const std::string name = folder_.file("image.raw");
         write_text(name, "first");
         std::filesystem::resize_file(name, static_cast<std::uintmax_t>(kFar));
-        {
-            const quo::Stream tail{std::fopen(name.c_str(), "ab")};
-            std::fputs("mark and tail", tail.get());
-        }
+        std::ofstream{name, std::ios::binary | std::ios::app} << "mark and tail";
         stream_.reset(std::fopen(name.c_str(), "r+b"));
         ASSERT_TRUE(stream_);
     }
@@ -58,9 +58,6 @@ TEST_F(Seek, CountsFromStartPositionAndEnd) {
     EXPECT_EQ(myfseek64_msc(stream_.get(), -3, 1), 0);  // within what the stream has buffered
     EXPECT_EQ(descriptor_at(), 2);
     EXPECT_EQ(read(3), "rst");
-}
-
-TEST_F(Seek, ReadsAgainAfterTheEndOfTheFile) {
     myfseek64_msc(stream_.get(), -4, 2);
     EXPECT_EQ(read(10), "tail");
     ASSERT_NE(std::feof(stream_.get()), 0);
@@ -72,9 +69,8 @@ TEST_F(Seek, ReadsAgainAfterTheEndOfTheFile) {
 TEST_F(Seek, FlushesWhatWasWrittenAndWritesAtTheNewPlace) {
     std::fputs("FIRST", stream_.get());
     EXPECT_EQ(myfseek64_msc(stream_.get(), kFar + 5, 0), 0);
-    const quo::Stream other{std::fopen(folder_.file("image.raw").c_str(), "rb")};
-    std::string seen(5, '\0');
-    EXPECT_EQ(std::fread(seen.data(), 1, 5, other.get()), 5U);
+    std::string seen;
+    std::ifstream{folder_.file("image.raw")} >> std::setw(5) >> seen;
     EXPECT_EQ(seen, "FIRST");
     std::fputs("AND", stream_.get());
     EXPECT_EQ(myfseek64_msc(stream_.get(), -8, 1), 0);
@@ -84,13 +80,10 @@ TEST_F(Seek, FlushesWhatWasWrittenAndWritesAtTheNewPlace) {
 TEST_F(Seek, RefusesWhatLeadsNowhere) {
     myfseek64_msc(stream_.get(), 2, 0);
     EXPECT_EQ(myfseek64_msc(nullptr, 0, 0), -1);
-    EXPECT_EQ(myfseek64_msc(stream_.get(), 0, 3), -1);
-    EXPECT_EQ(myfseek64_msc(stream_.get(), 0, -1), -1);
-    EXPECT_EQ(myfseek64_msc(stream_.get(), -1, 0), -1);
-    EXPECT_EQ(myfseek64_msc(stream_.get(), -3, 1), -1);
-    EXPECT_EQ(myfseek64_msc(stream_.get(), std::numeric_limits<std::int64_t>::max(), 1), -1);
+    for (const auto& [offset, whence] : {std::pair{std::int64_t{0}, 3}, {0, -1}, {-1, 0}, {-3, 1}, {INT64_MAX, 1}})
+        EXPECT_EQ(myfseek64_msc(stream_.get(), offset, whence), -1) << offset << " from " << whence;
     EXPECT_EQ(read(3), "rst");
-    EXPECT_EQ(myfseek64_msc(stream_.get(), std::numeric_limits<std::int64_t>::max(), 2), -1);
+    EXPECT_EQ(myfseek64_msc(stream_.get(), INT64_MAX, 2), -1);
 
     int ends[2];
     ASSERT_EQ(pipe(ends), 0);
