@@ -52,8 +52,8 @@ QUO_BASE_API int ludcmp(double** a, int n, int* indx, double* d) QUO_NOEXCEPT;
 /** Solves a x = b with the factors and exchanges of ludcmp(); b[1..n] becomes x. */
 QUO_BASE_API void lubksb(double** a, int n, const int* indx, double* b) QUO_NOEXCEPT;
 /** Gauss-Jordan elimination with full pivoting: a[1..n][1..n] becomes its inverse, the m right-hand sides in
- * b[1..n][1..m] their solutions. Returns 7, or 10 after "ld-gaussj: Singular Matrix-1" (no pivot is left to
- * choose: a value is not a number) or "ld-gaussj: Singular Matrix-2" (the pivot is zero); both matrices then hold
+ * b[1..n][1..m] their solutions. Returns 7, or 10 after "ld-gaussj: Singular Matrix-1" (the pivot would be a
+ * value that is not finite) or "ld-gaussj: Singular Matrix-2" (the pivot is zero); both matrices then hold
  * what the elimination left. n < 1 gives 10. */
 QUO_BASE_API int gaussj(double** a, int n, double** b, int m) QUO_NOEXCEPT;
 /** gaussj() on the matrices of ldmatrix(). */
@@ -64,7 +64,7 @@ QUO_BASE_API void covsrt(double** covar, int ma, const int* ia, int mfit) QUO_NO
 /** QR decomposition of a[1..n][1..n] in place by Householder reflections: R without its diagonal above the
  * diagonal, its diagonal in d[1..n], reflection j is 1 - u u^T / c[j] with u in column j from the diagonal down.
  * *sing becomes 1 when R is singular, else 0; the decomposition is complete either way. Returns 0, or 10 for n
- * < 1. */
+ * < 1 or a value that is not finite. */
 QUO_BASE_API int qrdcmp(double** a, int n, double* c, double* d, int* sing) QUO_NOEXCEPT;
 /** Solves a x = b with the factors of qrdcmp(); b[1..n] becomes x. Returns 0, or 10 when R is singular, with b
  * unchanged. */
@@ -89,7 +89,7 @@ QUO_BASE_API int lfitd(const double* x, const double* y, const double* sig, int 
  * matrix, singular values below 1e-5 of the largest set to 0; *chisq the weighted sum of squared residuals. Fewer
  * points than parameters: "SVDCMP: You must augment A with extra zero rows", 10; a singular value that does not
  * settle in 60 steps, or input that is not finite: "No convergence in 60 SVDCMP iterations", 10. Returns 0, 7
- * or 10. */
+ * or 10; a failure leaves a and *chisq as they were, u, w and v with what it had made of them. */
 QUO_BASE_API int svdfit(const double* x, const double* y, const double* sig, int n, double* a, int ma, double** u,
                         double** v, double* w, double* chisq, QuoBasisFunction basis) QUO_NOEXCEPT;
 

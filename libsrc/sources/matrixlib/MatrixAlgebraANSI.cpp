@@ -142,7 +142,7 @@ public:
     const char* run() {
         for (int stage = 0; stage < n_; ++stage) {
             const auto [row, column] = find_pivot();
-            if (row < 0) return "ld-gaussj: Singular Matrix-1";
+            if (row < 0 || !std::isfinite(a_[row][column])) return "ld-gaussj: Singular Matrix-1";
             used_[column] = 1;
             bring_to_diagonal(row, column);
             row_of_[stage] = row;
@@ -215,6 +215,13 @@ int tracked_gauss_jordan(const char* name, double** a, int n, double** b, int m)
         return frame.silent(QUO_NUMERIC);
     }
     return frame.success();
+}
+
+bool all_finite(const Rows& a, int n) {
+    for (int i = 0; i < n; ++i) {
+        if (!std::all_of(a[i], a[i] + n, [](double value) { return std::isfinite(value); })) return false;
+    }
+    return true;
 }
 
 // Reflects column `column` of the rows from `from` on by 1 - u u^T / c, u in column `from`.
@@ -332,7 +339,7 @@ void covsrt(double** covar, int ma, const int* ia, int mfit) noexcept {
 
 int qrdcmp(double** a, int n, double* c, double* d, int* sing) noexcept {
     quo::CallFrame frame{"qrdcmp", quo::kMatrixSource};
-    if (n < 1) return frame.silent(QUO_NUMERIC);
+    if (n < 1 || !all_finite(Rows{a}, n)) return frame.silent(QUO_NUMERIC);
     const Rows rows{a};
     *sing = 0;
     for (int j = 0; j < n - 1; ++j) {

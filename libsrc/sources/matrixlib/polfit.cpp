@@ -1,5 +1,6 @@
 #include <algorithm>
 #include <cstddef>
+#include <limits>
 
 #include "diagnosticslib/call_frame.h"
 #include "matrixlib/matrix_kernels.h"
@@ -9,6 +10,9 @@ namespace {
 
 // Reports of the polynomial fits carry the name of the source that they once stood in.
 constexpr const char* kSource = R"(..\..\..\libsrc\sources\sarutillib\interp_orb)";
+
+// Above it the number of power sums is no int.
+constexpr int kMostDegree = std::numeric_limits<int>::max() / 3 - 1;
 
 /** The normal equations in powers of x: the element at (i, j) is the sum of x^(i+j), so that 2d + 1 sums make them
  * all. Points are added in their order, powers formed by repeated multiplication. */
@@ -72,7 +76,8 @@ private:
 
 int dpolfit(const double* x, const double* y, int n, double* c, int degree) {
     quo::CallFrame frame{"dpolfit", kSource};
-    if (n < 1 || degree < 0) return frame.fail(QUO_NUMERIC, "No points or a negative degree");
+    if (n < 1 || degree < 0 || degree > kMostDegree)
+        return frame.fail(QUO_NUMERIC, "No points or no degree to fit");
     const int terms = degree + 1;
     quo::TrackedBuffer<double> work{PowerSums::room(terms)};
     double** a = ldmatrix(1, terms, 1, terms);
@@ -98,7 +103,8 @@ int polfit(const double* x, const double* y, int n, double* c, int d) noexcept {
     quo::CallFrame frame{"polfit()", kSource};
     const auto points = static_cast<std::size_t>(std::max(n, 0));
     quo::TrackedBuffer<double> copies{2 * points};
-    quo::TrackedBuffer<double> fitted{static_cast<std::size_t>(std::max(d, 0)) + 1};
+    const auto terms = static_cast<std::size_t>(d > kMostDegree ? 0 : std::max(d, 0)) + 1;
+    quo::TrackedBuffer<double> fitted{terms};
     if (!copies || !fitted) return frame.silent(QUO_NO_MEMORY);
     std::copy_n(x, points, copies.data());
     std::copy_n(y, points, copies.data() + points);
@@ -111,7 +117,7 @@ int polfit(const double* x, const double* y, int n, double* c, int d) noexcept {
 
 int gen_polfit(int ncoef, const double* x, const double* y, int n, double* c, double* sse) noexcept {
     quo::CallFrame frame{"gen_polfit()", kSource};
-    if (const int status = dpolfit(x, y, n, c, ncoef - 1)) return frame.callee(status);
+    if (const int status = dpolfit(x, y, n, c, std::max(ncoef, 0) - 1)) return frame.callee(status);
     if (sse) {
         double sum = 0.0;
         for (int k = 0; k < n; ++k) {

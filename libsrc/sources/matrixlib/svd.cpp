@@ -128,9 +128,8 @@ private:
         }
     }
 
-    [[nodiscard]] bool negligible(int i) const {
-        return std::abs(e_[i]) <= kEpsilon * (std::abs(d_[i]) + std::abs(d_[i - 1]));
-    }
+    // Against the whole matrix: against its neighbours alone, rounding keeps an element of a graded matrix alive.
+    [[nodiscard]] bool negligible(int i) const { return std::abs(e_[i]) <= kEpsilon * norm_; }
 
     // Works on the block that ends at `last` until its final off-diagonal element is gone.
     bool settle(int last) {
