@@ -1,7 +1,8 @@
-// Images of several shapes through the library's plans and through FFTW's own batched, measured plans;
-// zero-padding row by row beside FFTW over the whole image; making a plan that is known. The summary at the end
-// prints the ratios.
+// Images of several shapes through the library's plans and through the batched plans of the engine itself, of FFTW
+// (measured) and, where it is installed, of MKL; zero-padding row by row beside FFTW over the whole image; making
+// a plan that is known. The summary at the end prints the ratios.
 #include <benchmark/benchmark.h>
+#include <dlfcn.h>
 #include <fftw3.h>
 
 #include <algorithm>
@@ -14,6 +15,7 @@
 #include "quo_base/fft.h"
 #include "quo_base/interp.h"
 #include "ratio_reporter.h"
+#include "signallib/fft_engine.h"
 
 namespace {
 
@@ -49,9 +51,15 @@ void tame(fcomplex* image, int n, int m) {
     std::fill_n(image, static_cast<std::size_t>(n) * static_cast<std::size_t>(m), fcomplex{0.37F, -0.11F});
 }
 
-void own(benchmark::State& state, const Job& job) {
+void choose(const char* engine) {
+    setenv("QUO_FFT_ENGINE", engine, 1);
+    quo::forget_fft_engine();
+}
+
+void own(benchmark::State& state, const Job& job, const char* engine) {
     const Image image = make_image(job.n, job.m);
     FftPlan plan{};
+    choose(engine);
     if (fft_makep_c(&plan, job.n, job.n, job.m, job.m, job.rows, job.columns, 1) != 0)
         return state.SkipWithError("no plan");
     for (auto _ : state) {
@@ -85,11 +93,70 @@ void bare(benchmark::State& state, const Job& job) {
     for (fftwf_plan plan : plans) fftwf_destroy_plan(plan);
 }
 
+/** MKL without the library: forward transforms in place, by their numbers in DFTI's C interface. */
+class Dfti {
+public:
+    Dfti() {
+        void* const library = dlopen("libmkl_rt.so", RTLD_NOW | RTLD_LOCAL);
+        if (!library) return;
+        const auto find = [library](const char* name, auto& function) {
+            function = reinterpret_cast<std::remove_reference_t<decltype(function)>>(dlsym(library, name));
+        };
+        find("DftiCreateDescriptor", create_);
+        find("DftiSetValue", set_);
+        find("DftiCommitDescriptor", commit_);
+        find("DftiComputeForward", forward_);
+        find("DftiFreeDescriptor", free_);
+    }
+    [[nodiscard]] bool found() const { return create_ && set_ && commit_ && forward_ && free_; }
+
+    [[nodiscard]] void* batch(const Job& job, bool rows) const {
+        void* handle = nullptr;
+        const long strides[] = {0, rows ? 1 : job.n}, distance = rows ? job.n : 1;
+        create_(&handle, 35, 32, 1L, long{rows ? job.n : job.m});
+        set_(handle, 7, long{rows ? job.m : job.n});
+        for (const int parameter : {12, 13}) set_(handle, parameter, strides);
+        for (const int parameter : {14, 15}) set_(handle, parameter, distance);
+        set_(handle, 27, 1L);
+        commit_(handle);
+        return handle;
+    }
+    void run(void* handle, fcomplex* data) const { forward_(handle, data); }
+    void release(void* handle) const { free_(&handle); }
+
+private:
+    long (*create_)(void**, int, int, long, ...) = nullptr;
+    long (*set_)(void*, int, ...) = nullptr;
+    long (*commit_)(void*) = nullptr;
+    long (*forward_)(void*, void*, ...) = nullptr;
+    long (*free_)(void**) = nullptr;
+};
+
+const Dfti& dfti() {
+    static const Dfti dfti;
+    return dfti;
+}
+
+void bare_mkl(benchmark::State& state, const Job& job) {
+    const Image image = make_image(job.n, job.m);
+    std::vector<void*> batches;
+    if (job.rows) batches.push_back(dfti().batch(job, true));
+    if (job.columns) batches.push_back(dfti().batch(job, false));
+    for (auto _ : state) {
+        state.PauseTiming();
+        tame(image.get(), job.n, job.m);
+        state.ResumeTiming();
+        for (void* batch : batches) dfti().run(batch, image.get());
+    }
+    for (void* batch : batches) dfti().release(batch);
+}
+
 constexpr int kRows = 1024, kShort = 4096, kLong = 8192;
 
 void pad_own(benchmark::State& state) {
     const Image in = make_image(kShort, kRows), out = make_image(kLong, kRows);
     interp resampler;
+    choose("fftw");
     if (resampler.setplans(kShort, kRows, kLong, kRows) != 0) return state.SkipWithError("no plan");
     for (auto _ : state) {
         state.PauseTiming();
@@ -148,17 +215,23 @@ void two_microseconds(benchmark::State& state) {
 
 int main(int argc, char** argv) {
     setenv("QUO_FFTW_MODULE", QUO_BENCH_FFTW_MODULE, 0);
+    choose("mkl");  // before anything else calls MKL, so that all its transforms are sequential
+    const bool has_mkl = dfti().found() && std::string{fft_engine_name()} == "mkl";
     static std::vector<std::string> names;
-    names.reserve(2 * std::size(kJobs));
+    names.reserve(6 * std::size(kJobs));
     std::vector<bench::Ratio> ratios;
+    const auto add = [&](const Job& job, const char* engine, auto bare_engine, double target) {
+        const std::string& own_name = names.emplace_back(std::string{"own_"} + engine + "/" + job.name);
+        const std::string& bare_name = names.emplace_back(std::string{engine} + "/" + job.name);
+        const std::string& ratio = names.emplace_back(std::string{job.name} + ", own by " + engine + " / bare");
+        benchmark::RegisterBenchmark(own_name.c_str(), own, job, engine)->Unit(benchmark::kMillisecond);
+        benchmark::RegisterBenchmark(bare_name.c_str(), bare_engine, job)->Unit(benchmark::kMillisecond);
+        ratios.push_back({ratio.c_str(), own_name.c_str(), bare_name.c_str(), target});
+    };
     for (const Job& job : kJobs) {
-        const std::string& mine = names.emplace_back(std::string{"own/"} + job.name);
-        const std::string& peer = names.emplace_back(std::string{"fftw/"} + job.name);
-        benchmark::RegisterBenchmark(mine.c_str(), own, job)->Unit(benchmark::kMillisecond);
-        benchmark::RegisterBenchmark(peer.c_str(), bare, job)->Unit(benchmark::kMillisecond);
-        const bool long_columns = job.columns && !job.rows && job.m >= 4096;
-        ratios.push_back({job.name, mine.c_str(), peer.c_str(),
-                          !long_columns ? 1.05 : (job.m == 5760 ? 1.0 / 1.5 : 1.0 / 1.25)});
+        const bool long_columns = job.columns && !job.rows && job.m == 4096;
+        add(job, "fftw", bare, job.m == 5760 ? 1.0 / 1.5 : long_columns ? 1.0 / 1.25 : 1.05);
+        if (has_mkl) add(job, "mkl", bare_mkl, 1.05);
     }
     benchmark::RegisterBenchmark("own/zero_padding", pad_own)->Unit(benchmark::kMillisecond);
     benchmark::RegisterBenchmark("fftw/zero_padding", pad_bare)->Unit(benchmark::kMillisecond);

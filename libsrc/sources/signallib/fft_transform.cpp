@@ -10,8 +10,8 @@
 namespace quo {
 namespace {
 
-/** Rows that are run together fill about so much of the nearest cache. */
-constexpr std::ptrdiff_t kRowBlockBytes = 32 << 10;
+/** Rows that are run together: enough for the engine to batch, and in the second cache several times over. */
+constexpr std::ptrdiff_t kRowBlockBytes = 128 << 10;
 /** Samples of a group of columns: bounds what measuring a strided batch costs. */
 constexpr int kGroupSamples = 1 << 21;
 constexpr int kLine = 16;  ///< groups of columns are multiples of whole cache lines
