@@ -8,9 +8,11 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
+#include <functional>
 #include <limits>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include "list_model.h"
@@ -19,7 +21,9 @@
 
 namespace {
 
+using namespace std::string_view_literals;
 using testing::ElementsAre;
+using testing::IsNan;
 
 constexpr const char* kSection = "Pulse";
 constexpr const char* kKey = "Length";
@@ -33,7 +37,13 @@ protected:
     void store(const char* value) { GetSetProfileChar(1, kSection, kKey, value, file()); }
     [[nodiscard]] const char* stored() const { return GetSetProfileChar(0, kSection, kKey, nullptr, file()); }
     [[nodiscard]] const char* file() const { return path_.c_str(); }
-    [[nodiscard]] std::string place() const { return " - SEC: Pulse, KEY: Length, FILE: " + path_; }
+    /** The report holds so many warnings of a list that is too short, and nothing else. */
+    void expect_warnings(std::size_t number, std::size_t read, int wanted) const {
+        const std::string message = "Read only " + std::to_string(read) + " elements of " +
+                                    std::to_string(wanted) + " - SEC: Pulse, KEY: Length, FILE: " + path_;
+        EXPECT_EQ(report_.messages("WARNING"), std::vector<std::string>(number, message));
+        EXPECT_EQ(report_.entries().size(), number);
+    }
 
     test::Report report_;
     std::string path_ = report_.file("a.par");
@@ -86,104 +96,64 @@ TEST_P(ProfileIntList, IsReadAsFarAsItGoes) {
     EXPECT_EQ(GetMyProfileLongArray(kSection, kKey, longs.data(), list.count, file()), list.status);
     EXPECT_EQ(longs, expected);
 
-    const std::string warning =
-        "Read only " + std::to_string(list.read.size()) + " elements of " + std::to_string(list.count) + place();
-    const auto warnings = report_.entries("WARNING");
-    ASSERT_EQ(warnings.size(), list.status == 0 ? 0U : 2U);
-    for (const auto& entry : warnings) EXPECT_EQ(entry.message, warning);
-    EXPECT_EQ(report_.entries().size(), warnings.size());
+    expect_warnings(list.status == 0 ? 0 : 2, list.read.size(), list.count);
 }
 INSTANTIATE_TEST_SUITE_P(Lists, ProfileIntList, testing::ValuesIn(kIntLists),
                          [](const auto& row) { return std::string{row.param.name}; });
 
-TEST_F(ProfileAccess, Reads64BitIntegersToTheirBounds) {
+/** Reads `Count` numbers from a value. */
+template <std::size_t Count, typename Number, typename Reader>
+std::array<Number, Count> numbers(Reader reader, const char* file) {
+    std::array<Number, Count> values{};
+    EXPECT_EQ(reader(kSection, kKey, values.data(), int{Count}, file), 0);
+    return values;
+}
+
+TEST_F(ProfileAccess, ReadsEveryTypeToItsBounds) {
     store("{9223372036854775807 -9223372036854775808 9223372036854775808 -17}");
-    std::array<int64_t, 4> values{};
-    EXPECT_EQ(GetMyProfileInt64Array(kSection, kKey, values.data(), 4, file()), 0);
-    EXPECT_THAT(values, ElementsAre(INT64_MAX, INT64_MIN, INT64_MAX, -17));
-}
-
-TEST_F(ProfileAccess, ReadsDoubles) {
-    store("{17.3 -1e-3 .5 6.02214076e+23 1e999 -1e999 inf 0x1p-3}");
-    std::array<double, 8> values{};
-    const double infinity = std::numeric_limits<double>::infinity();
-    EXPECT_EQ(GetProfileDoubleArray(kSection, kKey, values.data(), 8, file()), 0);
-    EXPECT_THAT(values, ElementsAre(17.3, -1e-3, 0.5, 6.02214076e+23, infinity, -infinity, infinity, 0.125));
-}
-
-TEST_F(ProfileAccess, ReadsFloats) {
-    store("+17.3 -1e-3 1e39 -1e39 1e-46 1e-40 3.4028235e38 0x1p-3");
-    std::array<float, 8> values{};
-    const float infinity = std::numeric_limits<float>::infinity();
-    EXPECT_EQ(GetMyProfileFloatArray(kSection, kKey, values.data(), 8, file()), 0);
-    EXPECT_THAT(values, ElementsAre(17.3F, -1e-3F, infinity, -infinity, 0.0F, 1e-40F, 3.4028235e38F, 0.125F));
-}
-
-// A little above the middle between 1 and the next float. The nearest double is the middle itself, which rounds
-// down.
-TEST_F(ProfileAccess, RoundsFloatsOnce) {
-    store("1.00000005960464477539062500001");
-    float value = 0.0F;
-    EXPECT_EQ(GetMyProfileFloatArray(kSection, kKey, &value, 1, file()), 0);
-    EXPECT_EQ(value, std::nextafter(1.0F, 2.0F));
-}
-
-TEST_F(ProfileAccess, NotANumberIsANumber) {
-    store("{nan}");
-    float single = 0.0F;
-    double value = 0.0;
-    EXPECT_EQ(GetMyProfileFloatArray(kSection, kKey, &single, 1, file()), 0);
-    EXPECT_EQ(GetProfileDoubleArray(kSection, kKey, &value, 1, file()), 0);
-    EXPECT_TRUE(std::isnan(single) && std::isnan(value));
-}
-
-TEST_F(ProfileAccess, LongListIsReadToItsEnd) {
-    std::vector<int> values(100000), read(values.size());
-    for (std::size_t i = 0; i < values.size(); ++i) values[i] = static_cast<int>(i * 7919 % 65537) - 32768;
-    const int count = static_cast<int>(values.size());
-    EXPECT_EQ(WriteMyProfileIntArray(kSection, kKey, values.data(), count, file()), 0);
-    EXPECT_EQ(GetMyProfileIntArray(kSection, kKey, read.data(), count, file()), 0);
-    EXPECT_EQ(read, values);
+    EXPECT_THAT((numbers<4, int64_t>(GetMyProfileInt64Array, file())),
+                ElementsAre(INT64_MAX, INT64_MIN, INT64_MAX, -17));
+    constexpr double kInfinity = std::numeric_limits<double>::infinity();
+    store("{17.3 -1e-3 .5 6.02214076e+23 1e999 -1e999 inf 0x1p-3 nan}");
+    EXPECT_THAT((numbers<9, double>(GetProfileDoubleArray, file())),
+                ElementsAre(17.3, -1e-3, 0.5, 6.02214076e+23, kInfinity, -kInfinity, kInfinity, 0.125, IsNan()));
+    constexpr float kFloatInfinity = std::numeric_limits<float>::infinity();
+    // The last is a little above the middle between 1 and the next float: the nearest double is the middle itself,
+    // which would round down.
+    store("+17.3 -1e-3 1e39 -1e39 1e-46 1e-40 3.4028235e38 0x1p-3 nan 1.00000005960464477539062500001");
+    EXPECT_THAT((numbers<10, float>(GetMyProfileFloatArray, file())),
+                ElementsAre(17.3F, -1e-3F, kFloatInfinity, -kFloatInfinity, 0.0F, 1e-40F, 3.4028235e38F, 0.125F,
+                            IsNan(), std::nextafter(1.0F, 2.0F)));
 }
 
 /* ---- Writing numbers ---- */
 
-TEST_F(ProfileAccess, WritesLists) {
-    const std::array<int, 3> ints{1, -2, INT32_MIN};
-    EXPECT_EQ(WriteMyProfileIntArray(kSection, kKey, ints.data(), 3, file()), 0);
-    EXPECT_STREQ(stored(), "{1 -2 -2147483648}");
-    EXPECT_EQ(WriteMyProfileLongArray(kSection, kKey, ints.data(), 2, file()), 0);
-    EXPECT_STREQ(stored(), "{1 -2}");
-    const std::array<int64_t, 2> wide{INT64_MAX, INT64_MIN};
-    EXPECT_EQ(WriteMyProfileInt64Array(kSection, kKey, wide.data(), 2, file()), 0);
-    EXPECT_STREQ(stored(), "{9223372036854775807 -9223372036854775808}");
-    const std::array<float, 3> floats{1.0F / 3.0F, 16777216.0F, 1e-10F};
-    EXPECT_EQ(WriteMyProfileFloatArray(kSection, kKey, floats.data(), 3, file()), 0);
-    EXPECT_STREQ(stored(), "{0.3333333 1.677722e+07 1e-10}");
-    const std::array<double, 4> doubles{0.1, 2.0, 1.0 / 3.0, -std::numeric_limits<double>::infinity()};
-    EXPECT_EQ(WriteProfileDoubleArray(kSection, kKey, doubles.data(), 4, file()), 0);
-    EXPECT_STREQ(stored(), "{0.1 2 0.333333333333333 -inf}");
-}
-
-TEST_F(ProfileAccess, WritesNoElementsAsEmptyBraces) {
-    for (const int count : {0, -1}) {
-        store("before");
-        EXPECT_EQ(WriteMyProfileIntArray(kSection, kKey, nullptr, count, file()), 0);
-        EXPECT_STREQ(stored(), "{}");
-        EXPECT_EQ(WriteMyProfileDoubleMatrix(kSection, kKey, nullptr, count, 3, file()), 0);
-        EXPECT_STREQ(stored(), "{}");
+TEST_F(ProfileAccess, WritesScalarsAndLists) {
+    const int ints[] = {1, -2, INT32_MIN};
+    const int64_t wide[] = {INT64_MAX, INT64_MIN};
+    const float floats[] = {1.0F / 3.0F, 16777216.0F, 1e-10F};
+    const double doubles[] = {0.1, 2.0, 1.0 / 3.0, -std::numeric_limits<double>::infinity()};
+    const std::pair<std::function<int(const char*)>, const char*> rows[] = {
+        {[&](auto file) { return WriteMyProfileIntArray(kSection, kKey, ints, 3, file); }, "{1 -2 -2147483648}"},
+        {[&](auto file) { return WriteMyProfileLongArray(kSection, kKey, ints, 2, file); }, "{1 -2}"},
+        {[&](auto file) { return WriteMyProfileInt64Array(kSection, kKey, wide, 2, file); },
+         "{9223372036854775807 -9223372036854775808}"},
+        {[&](auto file) { return WriteMyProfileFloatArray(kSection, kKey, floats, 3, file); },
+         "{0.3333333 1.677722e+07 1e-10}"},
+        {[&](auto file) { return WriteProfileDoubleArray(kSection, kKey, doubles, 4, file); },
+         "{0.1 2 0.333333333333333 -inf}"},
+        {[&](auto file) { return WriteMyProfileInt(kSection, kKey, -17, file); }, "-17"},
+        {[&](auto file) { return WriteMyProfileInt64(kSection, kKey, INT64_MIN, file); }, "-9223372036854775808"},
+        {[&](auto file) { return WriteMyProfileDouble(kSection, kKey, 803457.3, file); }, "803457.3"},
+        {[&](auto file) { return WriteMyProfileIntArray(kSection, kKey, nullptr, 0, file); }, "{}"},
+        {[&](auto file) { return WriteMyProfileIntArray(kSection, kKey, nullptr, -1, file); }, "{}"},
+        {[&](auto file) { return WriteMyProfileDoubleMatrix(kSection, kKey, nullptr, 0, 3, file); }, "{}"},
+        {[&](auto file) { return WriteMyProfileDoubleMatrix(kSection, kKey, nullptr, 2, 0, file); }, "{}\n\t{}"},
+    };
+    for (const auto& [write, value] : rows) {
+        EXPECT_EQ(write(file()), 0);
+        EXPECT_STREQ(stored(), value);
     }
-    EXPECT_EQ(WriteMyProfileDoubleMatrix(kSection, kKey, nullptr, 2, 0, file()), 0);
-    EXPECT_STREQ(stored(), "{}\n\t{}");
-}
-
-TEST_F(ProfileAccess, WritesScalarsWithoutBraces) {
-    EXPECT_EQ(WriteMyProfileInt(kSection, kKey, -17, file()), 0);
-    EXPECT_STREQ(stored(), "-17");
-    EXPECT_EQ(WriteMyProfileInt64(kSection, kKey, INT64_MIN, file()), 0);
-    EXPECT_STREQ(stored(), "-9223372036854775808");
-    EXPECT_EQ(WriteMyProfileDouble(kSection, kKey, 803457.3, file()), 0);
-    EXPECT_STREQ(stored(), "803457.3");
 }
 
 // Column after column in memory, row after row in the file.
@@ -196,53 +166,32 @@ TEST_F(ProfileAccess, WritesMatricesRowByRow) {
     EXPECT_STREQ(stored(), "{\"11\" \"12\"}\n\t{\"21\" \" 22 \"}\n\t{\"31\" \"\"}");
 }
 
-/** A double of any magnitude, 53 random bits in it. */
-double any_double(test::Dice& dice) {
-    const std::uint64_t bits = (std::uint64_t{dice.below(0x7FF00000U)} << 32) | dice.below(0xFFFFFFFFU);
-    return dice.below(2) ? -std::bit_cast<double>(bits) : std::bit_cast<double>(bits);
-}
-
-TEST_F(ProfileAccess, NumbersCarryTheDigitsOfTheirType) {
+// Doubles go the way that the tests of the number texts cover; floats are narrowed on it.
+TEST_F(ProfileAccess, FloatsCarrySevenDigits) {
     test::Dice dice{318309};
     for (int i = 0; i < 2000; ++i) {
-        const double wide = any_double(dice);
-        const auto single = std::bit_cast<float>(dice.below(0x7F800000U));
+        const auto value = std::bit_cast<float>(dice.below(0x7F800000U));
         char text[64];
-
-        WriteMyProfileDouble(kSection, kKey, wide, file());
-        std::snprintf(text, sizeof text, "%.15g", wide);
+        std::snprintf(text, sizeof text, "{%.7g}", static_cast<double>(value));
+        WriteMyProfileFloatArray(kSection, kKey, &value, 1, file());
         ASSERT_STREQ(stored(), text);
-        double wide_read = 0.0;
-        ASSERT_EQ(GetProfileDoubleArray(kSection, kKey, &wide_read, 1, file()), 0);
-        ASSERT_EQ(wide_read, std::strtod(text, nullptr)) << text;
-        errno = 0;  // strtod's own: it counts a subnormal number as out of range
-
-        WriteMyProfileFloatArray(kSection, kKey, &single, 1, file());
-        std::snprintf(text, sizeof text, "{%.7g}", static_cast<double>(single));
-        ASSERT_STREQ(stored(), text);
-        float single_read = 0.0F;
-        ASSERT_EQ(GetMyProfileFloatArray(kSection, kKey, &single_read, 1, file()), 0);
-        ASSERT_EQ(single_read, std::strtof(text + 1, nullptr)) << text;
-        errno = 0;
+        const float expected = std::strtof(text + 1, nullptr);
+        errno = 0;  // strtof's own: it counts a subnormal number as out of range
+        ASSERT_EQ((numbers<1, float>(GetMyProfileFloatArray, file()))[0], expected) << text;
     }
 }
 
 TEST_F(ProfileAccess, RefusedWritesAreReported) {
     const double value = 17.3;
     const char* const text = "t";
-    const std::string message = "Parameter writing failed - SEC: Pulse, KEY: , FILE: " + path_;
-    EXPECT_EQ(WriteMyProfileString(kSection, nullptr, "v", file()), 10);
     EXPECT_EQ(WriteMyProfileStringQuote(kSection, nullptr, "v", file()), 10);
     EXPECT_EQ(WriteMyProfileStringArray(kSection, nullptr, &text, 1, file()), 10);
     EXPECT_EQ(WriteMyProfileStringMatrix(kSection, nullptr, &text, 1, 1, file()), 10);
-    EXPECT_EQ(WriteMyProfileInt(kSection, nullptr, 17, file()), 10);
-    EXPECT_EQ(WriteMyProfileInt64(kSection, nullptr, 17, file()), 10);
-    EXPECT_EQ(WriteMyProfileDouble(kSection, nullptr, 17.3, file()), 10);
-    EXPECT_EQ(WriteProfileDoubleArray(kSection, nullptr, &value, 1, file()), 10);
     EXPECT_EQ(WriteMyProfileDoubleMatrix(kSection, nullptr, &value, 1, 1, file()), 10);
-    EXPECT_EQ(report_.messages("WARNING"), std::vector<std::string>(9, message));
-    EXPECT_EQ(report_.entries("WARNING").front().function, "WriteMyProfileString");
-    EXPECT_EQ(report_.entries().size(), 9U);
+    EXPECT_EQ(report_.messages("WARNING"),
+              std::vector<std::string>(4, "Parameter writing failed - SEC: Pulse, KEY: , FILE: " + path_));
+    EXPECT_EQ(report_.entries().front().function, "WriteMyProfileStringQuote");
+    EXPECT_EQ(report_.entries().size(), 4U);
 }
 
 TEST_F(ProfileAccess, MissingDataIsAFailure) {
@@ -257,22 +206,19 @@ TEST_F(ProfileAccess, MissingDataIsAFailure) {
     EXPECT_EQ(report_.entries("WARNING").size(), 5U);
 }
 
+// The buffer stands for any type: nothing may be written.
 TEST_F(ProfileAccess, AMissingKeyIsSilent) {
-    int ints = 7;
-    int64_t wide = 7;
-    float single = 7.0F;
-    double value = 7.0;
-    char text[4] = "abc";
+    alignas(8) char text[] = "as before";
+    void* const any = text;
     char* const strings[] = {text};
-    EXPECT_EQ(GetMyProfileString(kSection, kKey, text, 4, file()), 10);
-    EXPECT_EQ(GetMyProfileStringArray(kSection, kKey, strings, 1, 4, file()), 10);
-    EXPECT_EQ(GetMyProfileIntArray(kSection, kKey, &ints, 1, file()), 10);
-    EXPECT_EQ(GetMyProfileInt64Array(kSection, kKey, &wide, 1, file()), 10);
-    EXPECT_EQ(GetMyProfileLongArray(kSection, kKey, &ints, 1, file()), 10);
-    EXPECT_EQ(GetMyProfileFloatArray(kSection, kKey, &single, 1, file()), 10);
-    EXPECT_EQ(GetProfileDoubleArray(kSection, kKey, &value, 1, file()), 10);
-    EXPECT_STREQ(text, "abc");
-    EXPECT_THAT((std::array{double(ints), double(wide), double(single), value}), ElementsAre(7, 7, 7, 7));
+    EXPECT_EQ(GetMyProfileString(kSection, kKey, text, 8, file()), 10);
+    EXPECT_EQ(GetMyProfileStringArray(kSection, kKey, strings, 1, 8, file()), 10);
+    EXPECT_EQ(GetMyProfileIntArray(kSection, kKey, static_cast<int*>(any), 1, file()), 10);
+    EXPECT_EQ(GetMyProfileInt64Array(kSection, kKey, static_cast<int64_t*>(any), 1, file()), 10);
+    EXPECT_EQ(GetMyProfileLongArray(kSection, kKey, static_cast<int32_t*>(any), 1, file()), 10);
+    EXPECT_EQ(GetMyProfileFloatArray(kSection, kKey, static_cast<float*>(any), 1, file()), 10);
+    EXPECT_EQ(GetProfileDoubleArray(kSection, kKey, static_cast<double*>(any), 1, file()), 10);
+    EXPECT_STREQ(text, "as before");
     EXPECT_EQ(report_.entries().size(), 0U);
 }
 
@@ -289,13 +235,9 @@ TEST_F(ProfileAccess, WarningsBoundTheNamesTheyShow) {
 /* ---- Strings ---- */
 
 TEST_F(ProfileAccess, CopiesStringsWithinTheirRoom) {
-    struct Copy {
-        int size;
-        std::string_view buffer;  // all of it, eight bytes
-    };
-    using namespace std::string_view_literals;
-    constexpr Copy kCopies[] = {{4, "abc\0####"sv},  {1, "\0#######"sv}, {6, "abcde\0##"sv}, {7, "abcdef\0#"sv},
-                                {8, "abcdef\0\0"sv}, {0, "########"sv},  {-5, "########"sv}};
+    constexpr std::pair<int, std::string_view> kCopies[] = {
+        {4, "abc\0####"sv},  {1, "\0#######"sv}, {6, "abcde\0##"sv}, {7, "abcdef\0#"sv},
+        {8, "abcdef\0\0"sv}, {0, "########"sv},  {-5, "########"sv}};
     store("abcdef");
     for (const auto& [size, expected] : kCopies) {
         std::string buffer(8, '#');
@@ -343,36 +285,28 @@ class ProfileStringList : public ProfileAccess, public testing::WithParamInterfa
 TEST_P(ProfileStringList, IsReadAsFarAsItGoes) {
     const StringList& list = GetParam();
     store(list.value);
-    std::array<std::array<char, 16>, 4> rooms{};
-    std::array<char*, 4> strings{};
-    for (std::size_t i = 0; i < rooms.size(); ++i) strings[i] = rooms[i].data();
-    for (auto& room : rooms) room.fill('#');
-
-    EXPECT_EQ(GetMyProfileStringArray(kSection, kKey, strings.data(), list.count, 16, file()), list.status);
+    std::vector<std::string> rooms(4, std::string(16, '#'));
+    char* const strings[] = {rooms[0].data(), rooms[1].data(), rooms[2].data(), rooms[3].data()};
+    EXPECT_EQ(GetMyProfileStringArray(kSection, kKey, strings, list.count, 16, file()), list.status);
     for (std::size_t i = 0; i < rooms.size(); ++i) {
-        if (i < list.read.size())
-            EXPECT_EQ(std::string{strings[i]}, list.read[i]);
-        else
-            EXPECT_THAT(rooms[i], testing::Each('#'));
+        const bool is_read = i < list.read.size();
+        EXPECT_EQ(is_read ? rooms[i].c_str() : rooms[i], is_read ? list.read[i] : std::string(16, '#'));
     }
-    const std::string warning =
-        "Read only " + std::to_string(list.read.size()) + " elements of " + std::to_string(list.count) + place();
-    EXPECT_EQ(report_.messages("WARNING"), std::vector<std::string>(list.warns ? 1 : 0, warning));
+    expect_warnings(list.warns ? 1 : 0, list.read.size(), list.count);
 }
 INSTANTIATE_TEST_SUITE_P(Lists, ProfileStringList, testing::ValuesIn(kStringLists),
                          [](const auto& row) { return std::string{row.param.name}; });
 
 TEST_F(ProfileAccess, StringListsAreCutToTheRoomPerString) {
     store(R"({"abcdef" "gh"})");
-    for (const int room : {4, 1, 0, -1}) {
-        std::array<char, 16> memory{};
-        memory.fill('#');
+    for (const auto& [room, expected] : {std::pair{4, "abc\0####gh\0#####"sv},
+                                         {1, "\0#######\0#######"sv},
+                                         {0, "################"sv},
+                                         {-1, "################"sv}}) {
+        std::string memory(16, '#');
         char* const strings[] = {memory.data(), memory.data() + 8};
         EXPECT_EQ(GetMyProfileStringArray(kSection, kKey, strings, 2, room, file()), 0);
-        const std::string expected = room == 4   ? std::string{"abc\0####gh\0#####", 16}
-                                     : room == 1 ? std::string{"\0#######\0#######", 16}
-                                                 : std::string(16, '#');
-        EXPECT_EQ((std::string{memory.data(), memory.size()}), expected) << room;
+        EXPECT_EQ(memory, expected) << room;
     }
 }
 
@@ -383,8 +317,8 @@ TEST_F(ProfileAccess, StringListsSurviveTheFile) {
     EXPECT_EQ(SyncProfile(file()), 0);
     FreeProfile(file());
 
-    std::array<std::array<char, 32>, 3> rooms{};
-    char* const strings[] = {rooms[0].data(), rooms[1].data(), rooms[2].data()};
+    char rooms[3][32];
+    char* const strings[] = {rooms[0], rooms[1], rooms[2]};
     EXPECT_EQ(GetMyProfileStringArray(kSection, kKey, strings, 3, 32, file()), 0);
     for (int i = 0; i < 3; ++i) EXPECT_STREQ(strings[i], written[i]);
 }

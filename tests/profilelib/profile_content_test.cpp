@@ -22,11 +22,8 @@ struct Line {
     const char* value;  // null: not there
 };
 constexpr Line kLines[] = {
-    {"PlainLine", "[s]\nk = 17.3\n", "s", "k", "17.3"},
-    {"ValueUntilTheEndOfTheFile", "[s]\nk = 17.3", "s", "k", "17.3"},
-    {"EmptyValue", "[s]\nk =\n", "s", "k", ""},
+    {"ValueUntilTheEndOfTheFile", "[s]\nk=17.3", "s", "k", "17.3"},
     {"EmptyValueAtTheEnd", "[s]\nk=", "s", "k", ""},
-    {"NoBlanksAroundEquals", "[s]\nk=v\n", "s", "k", "v"},
     {"BlanksAreTrimmed", "[s]\n   k   =   a  b   \n", "s", "k", "a  b"},
     {"SplitsAtTheFirstEquals", "[s]\nk=a=b \n", "s", "k", "a=b"},
     {"BlankInsideAKeyName", "[s]\nk j = 1\n", "s", "k j", "1"},
@@ -36,38 +33,28 @@ constexpr Line kLines[] = {
     {"TabStaysInAValue", "[s]\nk =\t1\t\n", "s", "k", "\t1\t"},
     {"CarriageReturnStaysInAValue", "[s]\r\nk = 1\r\n", "s", "k", "1\r"},
     {"CarriageReturnStaysInAKeyName", "[s]\r\n\rk = 1\n", "s", "\rk", "1"},
-    {"KeyBeforeAnEmptyLine", "[s]\nk = 1\n\nj = 2\n", "s", "k", "1"},
     {"EmptyLineHidesTheNextKey", "[s]\nk = 1\n\nj = 2\n", "s", "j", nullptr},
     {"EmptyLineJoinsTheNextKeyName", "[s]\nk = 1\n\nj = 2\n", "s", "\nj", "2"},
     {"LineWithoutEqualsJoinsTheNextKeyName", "[s]\n# note\nj = 2\n", "s", "# note\nj", "2"},
     {"EmptyLinesBeforeAHeaderAreHarmless", "[s]\nk = 1\n\n\n[t]\nj = 2\n", "t", "j", "2"},
     {"BlankLineOfBlanksIsStillAnEmptyLine", "[s]\n   \nj = 2\n", "s", "\nj", "2"},
     {"LineStartingWithEqualsIsSkipped", "[s]\n = k = 1\nj = 2\n", "s", "j", "2"},
-    {"KeyOfASkippedLine", "[s]\n=k = 1\n", "s", "k", nullptr},
-    {"BracketInAKeyNameOpensASection", "[s]\nabc[t]\nj = 2\n", "t", "j", "2"},
+    {"BracketInAKeyNameOpensASection", "[s]\nabc[t]=1\nj = 2\n", "t", "j", "2"},
     {"BracketInAKeyNameDropsIt", "[s]\nabc[t]=1\nj = 2\n", "s", "abc", nullptr},
-    {"BracketInASectionName", "[a[b]\nk = 1\n", "a[b", "k", "1"},
-    {"EqualsAndLineFeedInASectionName", "[a=\nb]\nk = 1\n", "a=\nb", "k", "1"},
-    {"SectionNameIsTrimmed", "[  a b  ]\nk = 1\n", "a b", "k", "1"},
-    {"SectionNameKeepsTabs", "[\ta]\nk = 1\n", "\ta", "k", "1"},
+    {"BracketEqualsAndLineFeedInASectionName", "[a[=\nb]\nk = 1\n", "a[=\nb", "k", "1"},
+    {"SectionNameIsTrimmedOfBlanksOnly", "[  \ta b  ]\nk = 1\n", "\ta b", "k", "1"},
     {"EmptySectionName", "[]\nk = 1\n", "", "k", "1"},
     {"RestOfTheHeaderLineIsSkipped", "[s] x = 1 [t]\nk = 2\n", "s", "k", "2"},
     {"KeyBehindAHeaderIsSkipped", "[s] x = 1\nk = 2\n", "s", "x", nullptr},
     {"TextBeforeTheFirstHeaderIsSkipped", "k = 1\n\n=\nnote [s]\nj = 2\n", "s", "j", "2"},
-    {"KeyBeforeTheFirstHeader", "k = 1\n[s]\n", "s", "k", nullptr},
     {"NoHeaderAtAll", "k = 1\n", "", "k", nullptr},
     {"UnclosedBracketHoldsNothing", "[s]\nk = 1\n[t\nj = 2\n", "t\nj = 2", "j", nullptr},
-    {"KeyBeforeAnUnclosedBracket", "[s]\nk = 1\n[t\nj = 2\n", "s", "k", "1"},
-    {"HeaderAtTheEnd", "[s]\nk = 1\n[t]", "s", "k", "1"},
     {"NamesAreCaseSensitive", "[s]\nk = 1\n", "S", "k", nullptr},
     {"LookUpDoesNotTrim", "[s]\nk = 1\n", "s", "k ", nullptr},
     {"LaterKeyWins", "[s]\nk = 1\nk = 2\n", "s", "k", "2"},
     {"LaterSectionWins", "[s]\nx = 1\n[t]\nx = 3\n[s]\nx = 2\n", "s", "x", "2"},
     {"EarlierSectionAnswersWhatTheLaterLacks", "[s]\nx = 1\n[s]\ny = 2\n", "s", "x", "1"},
-    {"NulEndsAValue", "[s]\nk = ab \0cd\nj = 1\n"sv, "s", "k", "ab"},
-    {"NulEndsAKeyName", "[s]\nk \0cd = 1\n"sv, "s", "k", "1"},
-    {"NulEndsASectionName", "[s\0cd]\nk = 1\n"sv, "s", "k", "1"},
-    {"NulBeforeTheFirstHeader", "\0\0[s]\nk = 1\n"sv, "s", "k", "1"},
+    {"NulEndsNamesAndValues", "\0[s\0cd]\nk \0cd = ab \0cd\nj = 1\n"sv, "s", "k", "ab"},
 };
 class ProfileGrammar : public testing::TestWithParam<Line> {};
 
@@ -80,53 +67,44 @@ TEST_P(ProfileGrammar, Holds) {
 INSTANTIATE_TEST_SUITE_P(Lines, ProfileGrammar, testing::ValuesIn(kLines),
                          [](const auto& row) { return std::string{row.param.name}; });
 
-TEST(ProfileContent, WritesInFileOrderWithNewEntriesLast) {
-    ProfileContent content;
-    content.parse("skipped\n[b] skipped\n z=1\n  a =  2 \n\n\n[a]\nm=\n=skipped\n[open\nk = 1\n");
-    content.set("b", "n", "3");
-    content.set("c", "o", "4");
-    content.set("b", "z", "5");
-    EXPECT_EQ(content.text(), "\n[b]\nz = 5\na = 2\nn = 3\n\n[a]\nm = \n\n[c]\no = 4\n");
-}
+/** A change to a file's content, and what is written back. */
+struct Change {
+    std::string_view before;
+    void (*change)(ProfileContent& content);
+    std::string_view after;
+};
+constexpr Change kChanges[] = {
+    {"skipped\n[b] skipped\n z=1\n  a =  2 \n\n\n[a]\nm=\n=skipped\n[open\nk = 1\n",
+     [](ProfileContent& c) { c.set("b", "n", "3"), c.set("c", "o", "4"), c.set("b", "z", "5"); },
+     "\n[b]\nz = 5\na = 2\nn = 3\n\n[a]\nm = \n\n[c]\no = 4\n"},
+    // Deliberate: a key is written into the last section of its name, also when an earlier one holds it.
+    {"[s]\nx = 1\n[s]\ny = 2\n", [](ProfileContent& c) { c.set("s", "x", "3"); },
+     "\n[s]\nx = 1\n\n[s]\ny = 2\nx = 3\n"},
+    // Deliberate: a key is deleted from the last section of its name only.
+    {"[s]\nx = 1\n[s]\nx = 2\nx = 3\n", [](ProfileContent& c) { c.erase_key("s", "x"); },
+     "\n[s]\nx = 1\n\n[s]\nx = 2\n"},
+    {"[s]\nx = 1\n[s]\nx = 2\n", [](ProfileContent& c) { c.erase_key("s", "x"), c.erase_key("s", "x"); },
+     "\n[s]\nx = 1\n\n[s]\n"},
+    {"[s]\nx = 1\n[t]\n[s]\nx = 3\nz = 4\n", [](ProfileContent& c) { c.erase_section("s"); },
+     "\n[s]\nx = 1\n\n[t]\n"},
+};
 
-TEST(ProfileContent, WritesIntoTheLaterOfTwoSections) {
-    ProfileContent content;
-    content.parse("[s]\nx = 1\n[s]\ny = 2\n");
-    content.set("s", "x", "3");
-    EXPECT_EQ(content.text(), "\n[s]\nx = 1\n\n[s]\ny = 2\nx = 3\n");
-    EXPECT_STREQ(content.find("s", "x"), "3");
-}
-
-TEST(ProfileContent, DeletingAKeyLeavesEarlierSectionsAlone) {
-    ProfileContent content;
-    content.parse("[s]\nx = 1\n[s]\nx = 2\nx = 3\n");
-    const char* const left[] = {"2", "1", "1"};
-    for (const char* value : left) {
-        content.erase_key("s", "x");
-        EXPECT_STREQ(content.find("s", "x"), value);
+TEST(ProfileContent, IsWrittenInFileOrderWithNewEntriesLast) {
+    for (const Change& row : kChanges) {
+        ProfileContent content;
+        content.parse(row.before);
+        row.change(content);
+        EXPECT_EQ(content.text(), row.after);
     }
-}
-
-TEST(ProfileContent, DeletingASectionUncoversTheEarlierOne) {
-    ProfileContent content;
-    content.parse("[s]\nx = 1\ny = 2\n[s]\nx = 3\nz = 4\n");
-    content.erase_section("s");
-    EXPECT_EQ(content.text(), "\n[s]\nx = 1\ny = 2\n");
-    EXPECT_STREQ(content.find("s", "x"), "1");
-    EXPECT_EQ(content.find("s", "z"), nullptr);
-    content.erase_section("s");
-    EXPECT_EQ(content.text(), "");
-    EXPECT_EQ(content.find("s", "x"), nullptr);
 }
 
 // A value may be set to itself, or to a part of itself: it must be copied before the old one goes.
 TEST(ProfileContent, SetsAKeyToItsOwnValue) {
+    const std::string value = "a text that is too long to be stored within a string object";
     ProfileContent content;
-    content.set("s", "k", "a text that is too long to be stored within a string object");
-    EXPECT_STREQ(content.set("s", "k", content.find("s", "k")),
-                 "a text that is too long to be stored within a string object");
-    EXPECT_STREQ(content.set("s", "k", content.find("s", "k") + 7),
-                 "that is too long to be stored within a string object");
+    content.set("s", "k", value);
+    EXPECT_EQ(content.set("s", "k", content.find("s", "k")), value);
+    EXPECT_EQ(content.set("s", "k", content.find("s", "k") + 7), value.substr(7));
 }
 
 /** Every name that stands in the model, and one that does not, must be answered alike. */
@@ -137,70 +115,27 @@ void expect_same(ProfileContent& content, const ListModel& model) {
         if (section.name) sections.insert(*section.name);
         for (const auto& key : section.keys) keys.insert(key.name);
     }
-    for (const auto& section : sections) {
+    for (const auto& section : sections)
         for (const auto& key : keys) {
             const char* const found = content.find(section, key);
             ASSERT_EQ(found ? std::optional<std::string>{found} : std::nullopt, model.get(section, key))
                 << "[" << section << "] " << key;
         }
-    }
 }
 
+// What is written also reads back as the same content, but for a NUL byte that left an empty name.
 TEST(ProfileContent, ReadsNoiseAsTheCharacterMachineDoes) {
     constexpr std::string_view kAlphabets[] = {"[]= \nab"sv, "[]]==  \n\n\t\r\0ab"sv, "[a]\n=\n=b\n"sv};
     Dice dice{20240611};
     for (int round = 0; round < 6000; ++round) {
         const std::string text =
             round % 4 == 3 ? "[s]\n" + dice.bytes(300) : dice.text(kAlphabets[round % 4], 120);
-        ProfileContent content;
+        ProfileContent content, again;
         content.parse(text);
         expect_same(content, ListModel{text});
-        if (HasFatalFailure()) FAIL() << "in round " << round << " on: " << testing::PrintToString(text);
-    }
-}
-
-// What is written reads back as the same content. (A NUL byte can leave an empty key name, which does not.)
-TEST(ProfileContent, WrittenTextReadsBack) {
-    Dice dice{7103};
-    for (int round = 0; round < 3000; ++round) {
-        ProfileContent content, again;
-        content.parse("[s]\n" + dice.text("[]==  \n\n\t\rab", 120));
         again.parse(content.text());
-        ASSERT_EQ(again.text(), content.text()) << "in round " << round;
-    }
-}
-
-TEST(ProfileContent, ChangesAsTheListsDo) {
-    Dice dice{577215};
-    const auto name = [&dice] { return std::string(1, "abcd"[dice.below(4)]); };
-    for (int file = 0; file < 40; ++file) {
-        std::string text;
-        for (unsigned lines = dice.below(40); lines > 0; --lines)
-            text += dice.below(4) == 0 ? "[" + name() + "]\n" : name() + "=" + name() + "\n";
-        ProfileContent content;
-        content.parse(text);
-        ListModel model{text};
-        for (int step = 0; step < 300; ++step) {
-            const std::string section = name(), key = name(), value = dice.text("xyz", 30);
-            switch (dice.below(8)) {
-                case 0:
-                    content.erase_section(section), model.erase_section(section);
-                    break;
-                case 1:
-                    [[fallthrough]];
-                case 2:
-                    content.erase_key(section, key), model.erase_key(section, key);
-                    break;
-                case 3:
-                    content.parse("[" + section + "]\n"), model.sections.push_back({section, {}});
-                    break;
-                default:
-                    EXPECT_EQ(content.set(section, key, value), value);
-                    model.set(section, key, value);
-            }
-            expect_same(content, model);
-            if (HasFatalFailure()) FAIL() << "in file " << file << ", step " << step;
-        }
+        EXPECT_TRUE(again.text() == content.text() || text.find('\0') != text.npos);
+        if (HasFailure()) FAIL() << "in round " << round << " on: " << testing::PrintToString(text);
     }
 }
 

@@ -28,23 +28,21 @@ struct Wrapper {
     void (*call)(const char* key);
     const char* message;
 };
-const Wrapper kReaders[] = {
-    {"String", [](const char* key) { GetCheckMyProfileString("s", key, text, 8, kFile); },
+const Wrapper kWrappers[] = {
+    {"GetString", [](const char* key) { GetCheckMyProfileString("s", key, text, 8, kFile); },
      "Error in GetMyProfileString: section s, key Length, file /nowhere/a.par\n"},
-    {"StringArray", [](const char* key) { GetCheckMyProfileStringArray("s", key, strings, 2, 8, kFile); },
+    {"GetStringArray", [](const char* key) { GetCheckMyProfileStringArray("s", key, strings, 2, 8, kFile); },
      "Error in GetMyProfileStringArray: section s, key Length, file /nowhere/a.par\n"},
-    {"IntArray", [](const char* key) { GetCheckMyProfileIntArray("s", key, ints, 2, kFile); },
+    {"GetIntArray", [](const char* key) { GetCheckMyProfileIntArray("s", key, ints, 2, kFile); },
      "Error in GetMyProfileIntArray: section s, key Length, file /nowhere/a.par\n"},
-    {"Int64Array", [](const char* key) { GetCheckMyProfileInt64Array("s", key, wide, 2, kFile); },
+    {"GetInt64Array", [](const char* key) { GetCheckMyProfileInt64Array("s", key, wide, 2, kFile); },
      "Error in GetMyProfileInt64Array: section s, key Length, file /nowhere/a.par\n"},
-    {"LongArray", [](const char* key) { GetCheckMyProfileLongArray("s", key, ints, 2, kFile); },
+    {"GetLongArray", [](const char* key) { GetCheckMyProfileLongArray("s", key, ints, 2, kFile); },
      "Error in GetMyProfileIntArray: section s, key Length, file /nowhere/a.par\n"},
-    {"FloatArray", [](const char* key) { GetCheckMyProfileFloatArray("s", key, floats, 2, kFile); },
+    {"GetFloatArray", [](const char* key) { GetCheckMyProfileFloatArray("s", key, floats, 2, kFile); },
      "Error in GetMyProfileFloatArray: section s, key Length, file /nowhere/a.par\n"},
-    {"DoubleArray", [](const char* key) { GetCheckMyProfileDoubleArray("s", key, doubles, 2, kFile); },
+    {"GetDoubleArray", [](const char* key) { GetCheckMyProfileDoubleArray("s", key, doubles, 2, kFile); },
      "Error in WriteMyProfileDouble: section s, key Length, file /nowhere/a.par\n"},
-};
-const Wrapper kWriters[] = {
     {"String", [](const char* key) { WriteCheckMyProfileString("s", key, "17.3", kFile); },
      "Error in WriteMyProfileString: section s, key , string 17.3, file /nowhere/a.par\n"},
     {"IntArray", [](const char* key) { WriteCheckMyProfileIntArray("s", key, ints, 2, kFile); },
@@ -65,40 +63,28 @@ const Wrapper kWriters[] = {
      "Error in WriteMyProfileDouble: section s, key , file /nowhere/a.par\n"},
 };
 
-class ProfileCheck : public testing::TestWithParam<Wrapper> {
-protected:
-    ProfileCheck() { FreeProfile(nullptr); }
-};
-class ProfileReadCheck : public ProfileCheck {};
-class ProfileWriteCheck : public ProfileCheck {};
+class ProfileCheck : public testing::TestWithParam<Wrapper> {};
 
-TEST_P(ProfileReadCheck, EndsTheProcessUnlessTheValueIsThere) {
-    EXPECT_EXIT(GetParam().call(kKey), testing::ExitedWithCode(1), testing::Eq(GetParam().message));
-    GetSetProfileChar(1, "s", kKey, GetParam().name == std::string{"StringArray"} ? R"({"3" "4"})" : "{3 4}",
-                      kFile);
-    GetParam().call(kKey);
-}
-INSTANTIATE_TEST_SUITE_P(Wrappers, ProfileReadCheck, testing::ValuesIn(kReaders),
-                         [](const auto& row) { return std::string{row.param.name}; });
-
-TEST_P(ProfileWriteCheck, EndsTheProcessUnlessTheValueIsStored) {
-    EXPECT_EXIT(GetParam().call(nullptr), testing::ExitedWithCode(1), testing::Eq(GetParam().message));
+TEST_P(ProfileCheck, EndsTheProcessUnlessTheValueIsThere) {
+    const std::string name = GetParam().name;
+    const bool reads = name.starts_with("Get");
+    EXPECT_EXIT(GetParam().call(reads ? kKey : nullptr), testing::ExitedWithCode(1),
+                testing::Eq(GetParam().message));
     EXPECT_EQ(GetSetProfileChar(0, "s", kKey, nullptr, kFile), nullptr);
+    if (reads) GetSetProfileChar(1, "s", kKey, name == "GetStringArray" ? R"({"3" "4"})" : "{3 4}", kFile);
     GetParam().call(kKey);
     EXPECT_NE(GetSetProfileChar(0, "s", kKey, nullptr, kFile), nullptr);
+    FreeProfile(kFile);
 }
-INSTANTIATE_TEST_SUITE_P(Wrappers, ProfileWriteCheck, testing::ValuesIn(kWriters),
+INSTANTIATE_TEST_SUITE_P(Wrappers, ProfileCheck, testing::ValuesIn(kWrappers),
                          [](const auto& row) { return std::string{row.param.name}; });
 
+// The plain function gives the number of strings read for its status: one too few is a failure, none at all is
+// not.
 TEST(ProfileReadCheck, TooFewElementsEndTheProcess) {
     GetSetProfileChar(1, "s", kKey, "{3}", kFile);
     EXPECT_EXIT(GetCheckMyProfileIntArray("s", kKey, ints, 2, kFile), testing::ExitedWithCode(1),
                 "Error in GetMyProfileIntArray");
-}
-
-// The plain function gives the number of strings read for its status: one too few is a failure, none at all is
-// not.
-TEST(ProfileReadCheck, EarlyClosingBraceOfAStringListEndsTheProcess) {
     GetSetProfileChar(1, "s", kKey, R"({"3"})", kFile);
     EXPECT_EXIT(GetCheckMyProfileStringArray("s", kKey, strings, 2, 8, kFile), testing::ExitedWithCode(1),
                 "Error in GetMyProfileStringArray");
@@ -119,15 +105,15 @@ TEST(ProfilePar, SetFormsReachTheDiskAtOnceAndGetFormsReadThem) {
               "\n[s]\nName = a b\nInt = {17 29}\nFloat = {17.5 29.5}\n\n[t]\nDouble = {17.5 29.5}\n");
 
     FreeProfile(file);
-    std::array<char, 512> name{};
+    char name[512];
     std::array<int, 2> int_values{};
     std::array<float, 2> float_values{};
     std::array<double, 2> double_values{};
-    EXPECT_EQ(GetParString(file, "Name", -1, name.data(), 0, "s"), 0);
+    EXPECT_EQ(GetParString(file, "Name", -1, name, 0, "s"), 0);
     EXPECT_EQ(GetParInt(file, "Int", 2, int_values.data(), 0, "s"), 0);
     EXPECT_EQ(GetParFloat(file, "Float", 2, float_values.data(), 0, "s"), 0);
     EXPECT_EQ(GetParDouble(file, "Double", 2, double_values.data(), 0, "t"), 0);
-    EXPECT_STREQ(name.data(), "a b");
+    EXPECT_STREQ(name, "a b");
     EXPECT_THAT(int_values, ElementsAre(17, 29));
     EXPECT_THAT(float_values, ElementsAre(17.5F, 29.5F));
     EXPECT_THAT(double_values, ElementsAre(17.5, 29.5));
@@ -136,23 +122,18 @@ TEST(ProfilePar, SetFormsReachTheDiskAtOnceAndGetFormsReadThem) {
 
 TEST(ProfilePar, StringsAreCutTo511Bytes) {
     GetSetProfileChar(1, "s", kKey, std::string(600, 'v').c_str(), kFile);
-    std::array<char, 513> buffer{};
-    buffer.back() = '#';
+    std::string buffer(513, '#');
     EXPECT_EQ(GetParString(kFile, kKey, 3, buffer.data(), 0, "s"), 0);
-    EXPECT_EQ(std::string{buffer.data()}, std::string(511, 'v'));
-    EXPECT_EQ(buffer.back(), '#');
+    EXPECT_EQ(buffer, std::string(511, 'v') + std::string("\0#", 2));
 }
 
+// The status is that of the write. A missing path must not turn into the sync of every file.
 TEST(ProfilePar, SetFormsReturnTheStatusOfTheWrite) {
-    EXPECT_EQ(SetParInt(kFile, kKey, 2, ints, 0, "s"), 0) << "though it cannot be synced";
-    EXPECT_EQ(SetParInt(kFile, nullptr, 2, ints, 0, "s"), 10);
-}
-
-// A missing path must not turn into the sync of every file.
-TEST(ProfilePar, SetWithoutAPathSyncsNothing) {
     const test::TemporaryFolder folder;
     const std::string path = folder.file("a.par");
     GetSetProfileChar(1, "s", kKey, "v", path.c_str());
+    EXPECT_EQ(SetParInt(kFile, kKey, 2, ints, 0, "s"), 0) << "though it cannot be synced";
+    EXPECT_EQ(SetParInt(kFile, nullptr, 2, ints, 0, "s"), 10);
     EXPECT_EQ(SetParInt(nullptr, kKey, 2, ints, 0, "s"), 10);
     EXPECT_EQ(test::read_text(path), "");
 }
