@@ -68,27 +68,6 @@ INSTANTIATE_TYPED_TEST_SUITE_P(Acquisition, HeaderObject, Cases, CaseName);
 }
 namespace {
 
-// A file that stands between the formats: neither an XML header nor a section of the right name.
-TEST(AcquisitionObjects, RefuseAFileOfNeitherKind) {
-    const test::TemporaryFolder folder;
-    const std::string file = folder.file("neither.txt");
-    test::write_text(file, "[Sampling]\nPRF = 1717.3\n");
-    SamplingConstants_Obj sampling;
-    EXPECT_EQ(sampling.readhdr(file.c_str()), 1);
-    EXPECT_EQ(sampling.prf_hz, -999.0);
-}
-
-TEST(AcquisitionObjects, WriteFifteenDigits) {
-    const test::TemporaryFolder folder;
-    const std::string file = folder.file("header.xml");
-    SamplingConstants_Obj sampling;
-    sampling.fc_hz = 5331004416.0;
-    sampling.lambda_m = 0.05623564240544047;
-    ASSERT_EQ(sampling.writehdr(file.c_str()), 0);
-    EXPECT_EQ(test::element_text(test::read_text(file), "fc_hz"), "<fc_hz>5331004416</fc_hz>");
-    EXPECT_EQ(test::element_text(test::read_text(file), "lambda_m"), "<lambda_m>0.0562356424054405</lambda_m>");
-}
-
 // A text longer than its member must not run into the next one.
 TEST(AcquisitionObjects, CutLongTextsToTheirMembers) {
     const test::TemporaryFolder folder;

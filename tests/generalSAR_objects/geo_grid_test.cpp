@@ -13,40 +13,24 @@ namespace {
 
 using testing::ElementsAre, testing::IsEmpty;
 
-constexpr const char* kSection = "GroundCornersPoints";
 constexpr const char* kPoints[] = {"NorthWest", "NorthEast", "SouthWest", "SouthEast", "Center"};
 
 std::vector<geopoint*> points_of(geoCoords_Obj& grid) {
     return {&grid.NorthWest, &grid.NorthEast, &grid.SouthWest, &grid.SouthEast, &grid.Center};
 }
-
-double value(std::size_t point, int i) { return 17.3 + 8.25 * static_cast<double>(point) + i; }
-
-void fill(geoCoords_Obj& grid) {
-    grid.EastingGridSize = 12.5;
-    grid.NorthingGridSize = 17.75;
-    std::size_t number = 0;
-    for (geopoint* point : points_of(grid)) {
-        point->Latitude = value(number, 0);
-        point->Longitude = value(number, 1);
-        point->Height = value(number, 2);
-        point->IncidenceAngle = value(number, 3);
-        point->LookAngle = value(number++, 4);
-    }
+/** Every value of a grid: the spacings, and five of each point. */
+std::vector<double*> values_of(geoCoords_Obj& grid) {
+    std::vector<double*> values{&grid.EastingGridSize, &grid.NorthingGridSize};
+    for (geopoint* p : points_of(grid))
+        values.insert(values.end(), {&p->Latitude, &p->Longitude, &p->Height, &p->IncidenceAngle, &p->LookAngle});
+    return values;
 }
-
-/** Compares every value of two grids. */
+void fill(geoCoords_Obj& grid) {
+    double next = 12.5;
+    for (double* value : values_of(grid)) *value = next += 5.25;
+}
 void expect_same(geoCoords_Obj& a, geoCoords_Obj& b) {
-    EXPECT_THAT(test::differing_fields(a, b), IsEmpty());
-    for (std::size_t i = 0; i < 5; ++i) {
-        SCOPED_TRACE(kPoints[i]);
-        const geopoint &left = *points_of(a)[i], &right = *points_of(b)[i];
-        EXPECT_EQ(left.Latitude, right.Latitude);
-        EXPECT_EQ(left.Longitude, right.Longitude);
-        EXPECT_EQ(left.Height, right.Height);
-        EXPECT_EQ(left.IncidenceAngle, right.IncidenceAngle);
-        EXPECT_EQ(left.LookAngle, right.LookAngle);
-    }
+    for (std::size_t i = 0; i < 27; ++i) EXPECT_EQ(*values_of(a)[i], *values_of(b)[i]) << i;
 }
 
 class GeoGrid : public testing::Test {
@@ -64,8 +48,9 @@ TEST_F(GeoGrid, ComesBackAndStandsInTheFileOnce) {
     const std::string text = test::read_text(file_);
     EXPECT_EQ(text, once);
     EXPECT_EQ(text.find("<GroundCornersPoints>"), text.rfind("<GroundCornersPoints>"));
-    EXPECT_THAT(test::child_names(text, kSection), ElementsAre("EastingGridSize", "NorthingGridSize", "NorthWest",
-                                                               "NorthEast", "SouthWest", "SouthEast", "Center"));
+    EXPECT_THAT(test::child_names(text, "GroundCornersPoints"),
+                ElementsAre("EastingGridSize", "NorthingGridSize", "NorthWest", "NorthEast", "SouthWest",
+                            "SouthEast", "Center"));
     ASSERT_EQ(target.readhdr(file_.c_str()), 0);
     expect_same(source, target);
 }
@@ -98,33 +83,28 @@ TEST_F(GeoGrid, NeedsBothSpacings) {
 TEST_F(GeoGrid, FallsBackToTheParameterFile) {
     geoCoords_Obj source, target, half;
     fill(source);
-    std::string text = "[GeoGridSize]\nEastingGridSize = 12.5\nNorthingGridSize = 17.75\n[Coordinates]\n";
+    const std::vector<double*> values = values_of(source);
+    std::string text = "[GeoGridSize]\nEastingGridSize = " + test::digits(*values[0]) + "\n", all = text;
+    all += "NorthingGridSize = " + test::digits(*values[1]) + "\n[Coordinates]\n";
     for (std::size_t point = 0; point < 5; ++point) {
-        text += std::string{kPoints[point]} + " = {";
-        for (int i = 0; i < 5; ++i) text += (i ? " " : "") + test::digits(value(point, i));
-        text += "}\n";
+        all += std::string{kPoints[point]} + " = {";
+        for (std::size_t i = 0; i < 5; ++i)
+            all += test::digits(*values[2 + 5 * point + i]) + (i < 4 ? " " : "}\n");
     }
-    test::write_text(file_, text);
+    test::write_text(file_, all);
     ASSERT_EQ(target.readhdr(file_.c_str()), 0);
     expect_same(source, target);
-
-    const std::string other = report_.file("half.par");
-    test::write_text(other, "[GeoGridSize]\nEastingGridSize = 12.5\n");
-    EXPECT_EQ(half.readhdr(other.c_str()), 1);
+    test::write_text(report_.file("half.par"), text);
+    EXPECT_EQ(half.readhdr(report_.file("half.par").c_str()), 1);
 }
 
-TEST_F(GeoGrid, LeavesTheFileWhenItCannotBeWritten) {
-    geoCoords_Obj grid;
+TEST_F(GeoGrid, ClonesAndLeavesTheFileWhenItCannotBeWritten) {
+    geoCoords_Obj grid, copy;
     fill(grid);
+    EXPECT_EQ(grid.clone(&copy), 0);
+    expect_same(grid, copy);
     EXPECT_EQ(grid.writehdr(report_.file("no_such_folder/header.xml").c_str()), 1);
     EXPECT_GE(report_.entries("ERROR_CALL_TREE").size(), 1U);
-}
-
-TEST_F(GeoGrid, Clones) {
-    geoCoords_Obj source, target;
-    fill(source);
-    EXPECT_EQ(source.clone(&target), 0);
-    expect_same(source, target);
 }
 
 TEST_F(GeoGrid, KeepsTheRegionOfInterestInItsSection) {

@@ -1,6 +1,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <string>
 
 #include "quo_base/acquisition.h"
@@ -86,16 +87,12 @@ TEST(Geopoint, RefusesANameThatIsNoElement) {
 }
 
 TEST(Geopoint, ClonesMembersAndArray) {
+    const double values[] = {45.37, 7.25, 317.3, 23.1, 20.7};
     geopoint source, target;
     set(source, 45.37, 7.25, 317.3, 23.1, 20.7);
-    test::fill_fields(source);
+    std::ranges::copy(values, source.Point);
     EXPECT_EQ(source.clone(&target), 0);
-    EXPECT_EQ(target.Latitude, 45.37);
-    EXPECT_EQ(target.Longitude, 7.25);
-    EXPECT_EQ(target.Height, 317.3);
-    EXPECT_EQ(target.IncidenceAngle, 23.1);
-    EXPECT_EQ(target.LookAngle, 20.7);
-    EXPECT_THAT(test::differing_fields(source, target), testing::IsEmpty());
+    EXPECT_THAT(target, holds(45.37, 7.25, 317.3, 23.1, 20.7));
 }
 
 }  // namespace

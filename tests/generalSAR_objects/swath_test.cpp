@@ -1,6 +1,7 @@
 #include "quo_base/swath.h"
 
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "annex_files.h"
@@ -51,6 +52,7 @@ protected:
 
 TEST_F(SwathFile, ComesBackFromItsSection) {
     SwathInfo source, target;
+    test::expect_fields(source, Swath::kRows);
     test::fill_fields(source);
     source.Swst_changes = 3;
     const std::string name = report_.file("swath.xml");
@@ -60,8 +62,6 @@ TEST_F(SwathFile, ComesBackFromItsSection) {
     EXPECT_THAT(test::differing_fields(source, target), IsEmpty());
     EXPECT_THAT(target.Swst_changes_bursts, ElementsAre(0, 0, 0));
 }
-
-TEST_F(SwathFile, RegistersItsFields) { test::expect_fields(SwathInfo{}, Swath::kRows); }
 
 TEST_F(SwathFile, ReadsTheChangesOfAParameterFile) {
     SwathInfo source, target, without;
@@ -73,18 +73,13 @@ TEST_F(SwathFile, ReadsTheChangesOfAParameterFile) {
 }
 
 TEST_F(SwathFile, RefusesMissingKeys) {
-    SwathInfo source;
-    for (const test::FieldRow& row : Swath::kRows) {
-        SwathInfo target;
-        test::fill_fields(source);
-        source.Swst_changes = 0;
-        EXPECT_EQ(target.readhdr(file(test::profile_text(source, "SwathInfo", Swath::kRows, row.key)).c_str()), 1)
-            << row.key;
-    }
-    for (const char* values : {"", "Swst_changes_bursts = {17 29}\n"}) {
-        SwathInfo target;
-        EXPECT_EQ(target.readhdr(file(profile(source, 3, values)).c_str()), 1);
-    }
+    SwathInfo source, target;
+    std::vector<std::string> contents{profile(source, 3, ""),
+                                      profile(source, 3, "Swst_changes_bursts = {17 29}\n")};
+    source.Swst_changes = 0;
+    for (const test::FieldRow& row : Swath::kRows)
+        contents.push_back(test::profile_text(source, "SwathInfo", Swath::kRows, row.key));
+    for (const std::string& content : contents) EXPECT_EQ(target.readhdr(file(content).c_str()), 1) << content;
 }
 
 // A count far beyond what a file can mean takes no memory.
@@ -93,12 +88,12 @@ TEST_F(SwathFile, RefusesCountsThatNoSwathHas) {
         SwathInfo source, target;
         test::fill_fields(source);
         source.Swst_changes = changes;
-        const std::string name = report_.file("hostile.xml");
-        ASSERT_EQ(source.writehdr(name.c_str()), 0);
-        EXPECT_EQ(target.readhdr(name.c_str()), 1);
-        EXPECT_THAT(target.Swst_changes_bursts, IsEmpty());
-        EXPECT_EQ(target.readhdr(file(profile(source, changes, "Swst_changes_bursts = {1}\n")).c_str()), 1);
-        EXPECT_THAT(target.Swst_changes_bursts, IsEmpty());
+        const std::string header = report_.file("hostile.xml");
+        ASSERT_EQ(source.writehdr(header.c_str()), 0);
+        for (const std::string& name : {header, file(profile(source, changes, "Swst_changes_bursts = {1}\n"))}) {
+            EXPECT_EQ(target.readhdr(name.c_str()), 1);
+            EXPECT_THAT(target.Swst_changes_bursts, IsEmpty());
+        }
     }
 }
 
@@ -118,7 +113,7 @@ TEST_F(SwathFile, ClonesItsArrays) {
 }
 
 // --- burst times
-// --------------------------------------------------------------------------------------------------
+// ----------------------------------------------------------------------------------------------------
 
 class BurstTimes : public testing::Test {
 protected:
@@ -189,15 +184,13 @@ TEST_F(BurstTimes, NeedOnlyTheHeadersOfTheFirstLines) {
 
 TEST_F(BurstTimes, RefuseHostileCounts) {
     make();
-    const struct {
-        std::int32_t bursts, lines;
-        int status;
-    } rows[] = {{2147483647, 4, 4}, {3, 2147483647, 4}, {2147483647, 2147483647, 1}, {4, 4, 4}, {3, 0, 1},
-                {3, -4, 1},         {-999, 4, 1}};
-    for (const auto& row : rows) {
-        SCOPED_TRACE(testing::Message() << row.bursts << " bursts of " << row.lines << " lines");
-        describe(row.bursts, row.lines);
-        expect_status(row.status);
+    constexpr std::int32_t kMost = 2147483647;
+    const std::int32_t rows[][3] = {{kMost, 4, 4}, {3, kMost, 4}, {kMost, kMost, 1}, {4, 4, 4},
+                                    {3, 0, 1},     {3, -4, 1},    {-999, 4, 1}};
+    for (const auto& [bursts, lines, status] : rows) {
+        SCOPED_TRACE(testing::Message() << bursts << " bursts of " << lines << " lines");
+        describe(bursts, lines);
+        expect_status(status);
     }
     SwathInfo none;
     describe(0, 4);
@@ -210,13 +203,12 @@ TEST_F(BurstTimes, PassOnWhatFails) {
     make();
     std::filesystem::remove(name_);
     expect_status(9);
-    SwathInfo swath;
-    EXPECT_EQ(swath.readBurstTimes(""), 1);
-    EXPECT_EQ(swath.readBurstTimes(nullptr), 1);
+    for (const char* name : {"", static_cast<const char*>(nullptr)})
+        EXPECT_EQ(SwathInfo{}.readBurstTimes(name), 1);
 }
 
 // --- the antenna pattern
-// ------------------------------------------------------------------------------------------
+// --------------------------------------------------------------------------------------------
 
 class Pattern : public testing::Test {
 protected:
@@ -243,12 +235,6 @@ protected:
     const std::string name_ = report_.file("pattern"), header_ = name_ + ".hdr";
 };
 
-TEST_F(Pattern, RegistersItsFields) {
-    const test::FieldRow rows[] = {real("StartAngle"), real("DeltaAngle"),
-                                   whole("PatternSamples", 0, 0, 10000).is(test::Presence::kOptional)};
-    test::expect_fields(AntennaPattern_Obj{}, rows);
-}
-
 TEST_F(Pattern, ComesBackFromItsFiles) {
     write_pattern();
     std::string line;
@@ -256,6 +242,9 @@ TEST_F(Pattern, ComesBackFromItsFiles) {
     EXPECT_EQ(test::read_text(name_), line);
 
     AntennaPattern_Obj source, target;
+    const test::FieldRow rows[] = {real("StartAngle"), real("DeltaAngle"),
+                                   whole("PatternSamples", 0, 0, 10000).is(test::Presence::kOptional)};
+    test::expect_fields(source, rows);
     make_pattern(source);
     ASSERT_EQ(target.readhdr(header_.c_str()), 0);
     EXPECT_THAT(test::differing_fields(source, target), IsEmpty());
@@ -265,6 +254,11 @@ TEST_F(Pattern, ComesBackFromItsFiles) {
     EXPECT_THAT(target.Pattern, ElementsAre(1.5F, 0.0F, -0.25F));
     std::filesystem::remove(name_);
     EXPECT_THAT(samples(target), ElementsAre(1.5F, 0.0F, -0.25F)) << "read again although loaded";
+    AntennaPattern_Obj copy;
+    EXPECT_EQ(source.clone(&copy), 0);
+    EXPECT_THAT(test::differing_fields(source, copy), IsEmpty());
+    EXPECT_EQ(copy.Pattern, source.Pattern);
+    EXPECT_EQ(copy.PatternFile.FileName, name_);
 }
 
 TEST_F(Pattern, HasAsManySamplesAsItsRaster) {
@@ -276,6 +270,12 @@ TEST_F(Pattern, HasAsManySamplesAsItsRaster) {
     ASSERT_EQ(target.readhdr(header_.c_str()), 0);
     EXPECT_EQ(target.PatternSamples, 3);
     EXPECT_EQ(target.Pattern.size(), 3U);
+    DataFile raster;
+    ASSERT_EQ(raster.read_hdr(name_.c_str()), 0);
+    raster.NrOfPixelsPerLine = 2147483647;  // more than is plausible
+    ASSERT_EQ(raster.write_hdr(), 0);
+    EXPECT_EQ(target.readhdr(header_.c_str()), 1);
+    EXPECT_THAT(target.Pattern, IsEmpty());
 }
 
 TEST_F(Pattern, FallsBackToTheParameterFile) {
@@ -283,23 +283,17 @@ TEST_F(Pattern, FallsBackToTheParameterFile) {
                       raster =
                           "[RasterInfo]\nHeaderOffset = 0\nRowPrefix = 0\nNrOfPixelsPerLine = 3\n"
                           "NrOfLinesPerImage = 1\nCellType = FLOAT32\nByteOrder = LSBFirst\n";
-    const struct {
-        std::string content;
-        int status;
-    } rows[] = {{start + delta + raster, 0},
-                {start + delta + "PatternSamples = 17\n" + raster, 0},
-                {start + raster, 1},
-                {"[AntennaPattern]\n" + delta + raster, 1},
-                {start + delta, 1}};
-    for (const auto& row : rows) {
-        const std::string header = report_.file("old" + std::to_string(&row - rows) + ".hdr");
-        test::write_text(header, row.content);
+    const std::pair<std::string, int> rows[] = {{start + delta + raster, 0},
+                                                {start + delta + "PatternSamples = 17\n" + raster, 0},
+                                                {start + raster, 1},
+                                                {"[AntennaPattern]\n" + delta + raster, 1},
+                                                {start + delta, 1}};
+    for (const auto& [content, status] : rows) {
+        const std::string header = report_.file(std::to_string(content.size()) + ".hdr");
+        test::write_text(header, content);
         AntennaPattern_Obj pattern;
-        EXPECT_EQ(pattern.readhdr(header.c_str()), row.status) << row.content;
-        if (row.status == 0) {
-            EXPECT_EQ(pattern.StartAngle, 17.25);
-            EXPECT_EQ(pattern.PatternSamples, 3);
-        }
+        EXPECT_EQ(pattern.readhdr(header.c_str()), status) << content;
+        EXPECT_EQ(pattern.PatternSamples == 3 && pattern.StartAngle == 17.25, status == 0);
     }
     EXPECT_GE(report_.entries("ERROR_CALL_TREE").size(), 1U) << "a failing raster read is reported";
 }
@@ -328,17 +322,6 @@ TEST_F(Pattern, RefusesWhatIsNoPattern) {
     EXPECT_THAT(hostile.Pattern, IsEmpty());
 }
 
-TEST_F(Pattern, RefusesARasterOfMoreSamplesThanIsPlausible) {
-    write_pattern();
-    DataFile raster;
-    ASSERT_EQ(raster.read_hdr(name_.c_str()), 0);
-    raster.NrOfPixelsPerLine = 2147483647;
-    ASSERT_EQ(raster.write_hdr(), 0);
-    AntennaPattern_Obj pattern;
-    EXPECT_EQ(pattern.readhdr(header_.c_str()), 1);
-    EXPECT_THAT(pattern.Pattern, IsEmpty());
-}
-
 TEST_F(Pattern, FailsWithoutMemory) {
     write_pattern();
     test::fail_every_allocation([&] {
@@ -349,17 +332,8 @@ TEST_F(Pattern, FailsWithoutMemory) {
     });
 }
 
-TEST_F(Pattern, ClonesSamplesAndFile) {
-    AntennaPattern_Obj source, target;
-    make_pattern(source);
-    EXPECT_EQ(source.clone(&target), 0);
-    EXPECT_THAT(test::differing_fields(source, target), IsEmpty());
-    EXPECT_EQ(target.Pattern, source.Pattern);
-    EXPECT_EQ(target.PatternFile.FileName, name_);
-}
-
 // --- patterns of an annex file
-// ------------------------------------------------------------------------------------
+// --------------------------------------------------------------------------------------
 
 float annex_value(int record, int i) {
     return 17.25F * static_cast<float>(record) + 0.0625F * static_cast<float>(i);
