@@ -43,20 +43,17 @@ TEST(OrbitPolynomial, ValueAndDerivativesAreThoseOfAShiftedPower) {
 }
 
 TEST(OrbitPolynomial, OfNoCoefficientsIsZeroAndReadsNothing) {
-    EXPECT_EQ(POSMACRO(17.3, nullptr, 0), 0.0);
-    EXPECT_EQ(VELMACRO(17.3, nullptr, 0), 0.0);
-    EXPECT_EQ(ACCMACRO(17.3, nullptr, 0), 0.0);
+    for (const auto macro : {POSMACRO, VELMACRO, ACCMACRO}) EXPECT_EQ(macro(17.3, nullptr, 0), 0.0);
 }
 
 TEST(OrbitPolynomial, OfThreeAxesIsThatOfEach) {
     const std::vector<double> c[3] = {shifted_power(0.6, 4), shifted_power(-1.1, 4), shifted_power(2.3, 4)};
-    double position[3], velocity[3], acceleration[3];
-    POSVELACC_5(1.7, c[0].data(), c[1].data(), c[2].data(), position, velocity, acceleration);
+    double state[3][3];
+    POSVELACC_5(1.7, c[0].data(), c[1].data(), c[2].data(), state[0], state[1], state[2]);
     for (std::size_t axis = 0; axis < 3; ++axis) {
-        const double base = 1.7 + (axis == 0 ? 0.6 : axis == 1 ? -1.1 : 2.3);
-        EXPECT_NEAR(position[axis], std::pow(base, 4), 1e-12);
-        EXPECT_NEAR(velocity[axis], 4.0 * std::pow(base, 3), 1e-12);
-        EXPECT_NEAR(acceleration[axis], 12.0 * std::pow(base, 2), 1e-12);
+        EXPECT_NEAR(state[0][axis], POSMACRO(1.7, c[axis].data(), 5), 1e-12);
+        EXPECT_NEAR(state[1][axis], VELMACRO(1.7, c[axis].data(), 5), 1e-12);
+        EXPECT_NEAR(state[2][axis], ACCMACRO(1.7, c[axis].data(), 5), 1e-12);
     }
 }
 
