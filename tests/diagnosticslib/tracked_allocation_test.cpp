@@ -6,6 +6,7 @@
 #include <climits>
 #include <cstdint>
 #include <cstring>
+#include <functional>
 #include <random>
 #include <string>
 #include <utility>
@@ -144,10 +145,11 @@ TEST_F(Tracked, LeakReportListsTheTableInItsOrder) {
 
 // ---- Matrices
 
+// Without tracking nothing could reclaim the parts of one that fails: the leak sanitizer looks for them.
 TEST_F(Tracked, MatrixRowsAreZeroFilledAndGoTogether) {
     for (const bool tracking : {true, false}) {
         if (!tracking) exit_ckerr();
-        void** rows = matalloc_ckerr(17, 33);
+        void** const rows = matalloc_ckerr(17, 33);
         ASSERT_NE(rows, nullptr);
         for (int row = 0; row < 17; ++row) {
             auto* bytes = static_cast<char*>(rows[row]);
@@ -155,16 +157,15 @@ TEST_F(Tracked, MatrixRowsAreZeroFilledAndGoTogether) {
             std::memset(bytes, row + 1, 33);
         }
         matfree_ckerr(rows, 17);
+        for (const int none : {0, -1, INT_MIN}) {
+            void** const array = matalloc_ckerr(none, 10);
+            EXPECT_NE(array, nullptr);
+            matfree_ckerr(array, none);
+        }
+        matfree_ckerr(nullptr, 5);
+        EXPECT_EQ(matalloc_ckerr(3, overflowing), nullptr);
+        freeall_ckerr();
     }
-}
-
-TEST_F(Tracked, MatrixWithoutRowsIsAnEmptyArray) {
-    for (const int rows : {0, -1, INT_MIN}) {
-        void** const array = matalloc_ckerr(rows, 10);
-        EXPECT_NE(array, nullptr);
-        matfree_ckerr(array, rows);
-    }
-    matfree_ckerr(nullptr, 5);
 }
 
 TEST_F(Tracked, MatrixThatFailsLeavesItsPartsToFreeall) {
@@ -178,12 +179,6 @@ TEST_F(Tracked, MatrixThatFailsLeavesItsPartsToFreeall) {
     freeall_ckerr();
     EXPECT_EQ(limit.room(), 5);
     deccurdep();
-}
-
-// Nothing can reclaim the parts then: they are freed at once, which the leak sanitizer confirms.
-TEST_F(Tracked, MatrixThatFailsWithoutTrackingLeavesNothing) {
-    exit_ckerr();
-    EXPECT_EQ(matalloc_ckerr(3, overflowing), nullptr);
 }
 
 // ---- Capacity
@@ -212,148 +207,108 @@ TEST_F(Tracked, FullTableIsNoLimitWithoutTracking) {
 // ---- Against a plain model
 
 /** The table as it is described: a list that is searched from the front, with all counters in every entry. */
-class PlainTable {
-public:
-    void enter(std::string name) {
-        ++depth_;
-        ++counters_[slot()];
-        names_[slot()] = std::move(name);
+struct PlainTable {
+    using Counters = std::array<std::uint16_t, 64>;
+    struct Entry {
+        void* block;
+        std::size_t slot;
+        Counters counters;
+        std::string name;
+    };
+
+    std::size_t depth = 0;
+    Counters counters{};
+    std::array<std::string, 64> names{"main()"};
+    std::vector<Entry> entries;
+
+    [[nodiscard]] std::size_t slot() const { return std::min<std::size_t>(depth, 63); }
+    void enter(const std::string& name) {
+        ++depth;
+        ++counters[slot()];
+        names[slot()] = name;
     }
-    void leave() { depth_ -= depth_ > 0; }
-    void add(void* block) { entries_.push_back({block, slot(), counters_, names_[slot()]}); }
-    bool remove(void* block) {
-        const auto found = std::find_if(entries_.begin(), entries_.end(),
-                                        [block](const Entry& entry) { return entry.block == block; });
-        if (found == entries_.end()) return false;
-        *found = entries_.back();
-        entries_.pop_back();
-        return true;
+    void add(void* block) { entries.push_back({block, slot(), counters, names[slot()]}); }
+    void remove(void* block) {
+        const auto found =
+            std::find_if(entries.begin(), entries.end(), [block](const Entry& one) { return one.block == block; });
+        if (found == entries.end()) return;
+        *found = entries.back();
+        entries.pop_back();
     }
     void remove_own() {
-        for (bool again = true; again;) {
-            const auto found =
-                std::find_if(entries_.begin(), entries_.end(), [this](const Entry& entry) { return owns(entry); });
-            again = found != entries_.end() && remove(found->block);
+        for (;;) {
+            const auto found = std::find_if(entries.begin(), entries.end(), [this](const Entry& one) {
+                return std::equal(counters.begin() + 1, counters.begin() + 1 + slot(), one.counters.begin() + 1);
+            });
+            if (found == entries.end()) return;
+            remove(found->block);
         }
     }
     [[nodiscard]] std::string leak_lines() const {
         std::string text;
-        for (const Entry& entry : entries_) {
+        for (const Entry& entry : entries) {
             text += entry.name + " : ";
-            for (std::size_t depth = 0; depth <= entry.depth; ++depth)
-                text += std::to_string(entry.counters[depth]) + "\t";
+            for (std::size_t i = 0; i <= entry.slot; ++i) text += std::to_string(entry.counters[i]) + "\t";
             text += "\n";
         }
         return text;
     }
-    [[nodiscard]] std::vector<void*> blocks() const {
-        std::vector<void*> all;
-        for (const Entry& entry : entries_) all.push_back(entry.block);
-        return all;
-    }
-    [[nodiscard]] std::size_t depth() const { return depth_; }
-
-private:
-    using Counters = std::array<std::uint16_t, 64>;
-    struct Entry {
-        void* block;
-        std::size_t depth;
-        Counters counters;
-        std::string name;
-    };
-    [[nodiscard]] std::size_t slot() const { return std::min<std::size_t>(depth_, 63); }
-    [[nodiscard]] bool owns(const Entry& entry) const {
-        for (std::size_t depth = slot(); depth >= 1; --depth)
-            if (entry.counters[depth] != counters_[depth]) return false;
-        return true;
-    }
-
-    std::size_t depth_ = 0;
-    Counters counters_{};
-    std::array<std::string, 64> names_{"main()"};
-    std::vector<Entry> entries_;
 };
 
 /** Weights of the random steps, and how deep the calls go. */
 struct Mix {
     const char* name;
-    int rounds, steps, deepest;
-    std::array<double, 8>
-        weights;  // enter, leave, allocate, fail, free a live one, free null, free an unknown, freeall
+    int rounds, steps;
+    std::size_t deepest;
+    double enter, leave, allocate, fail, free_a_live_one, free_null, free_an_unknown, freeall;
 };
-
-class AgainstPlainTable : public testing::TestWithParam<Mix> {
-protected:
-    void step(int kind) {
-        switch (kind) {
-            case 0:
-                return enter();
-            case 1:
-                return plain.leave(), deccurdep();
-            case 2:
-                return plain.add(malloc_ckerr(random(40)));
-            case 3:
-                return plain.add(malloc_ckerr(overflowing));
-            case 4:
-                return remove(any_live());
-            case 5:
-                return remove(nullptr);
-            case 6:
-                return remove(&unknown_[random(16)]);
-            default:
-                plain.remove_own();
-                freeall_ckerr();
-        }
-    }
-    std::size_t random(std::size_t below) {
-        return std::uniform_int_distribution<std::size_t>{0, below - 1}(engine);
-    }
-
-    std::mt19937 engine{20140403};
-    PlainTable plain;
-
-private:
-    void enter() {
-        if (plain.depth() >= static_cast<std::size_t>(GetParam().deepest)) return;
-        const std::string name = "f" + std::to_string(calls_++);
-        plain.enter(name);
-        set_ckerr_fun(name.c_str());
-    }
-    void remove(void* block) {
-        plain.remove(block);
-        free_ckerr(block);
-    }
-    void* any_live() {
-        const auto blocks = plain.blocks();
-        return blocks.empty() ? nullptr : blocks[random(blocks.size())];
-    }
-
-    int calls_ = 0;
-    char unknown_[16] = {};
-};
+class AgainstPlainTable : public testing::TestWithParam<Mix> {};
 
 // Names differ from call to call, so the leak report shows the order of the table; blocks that the plain table
 // holds and the other has freed, or the reverse, show under the sanitizers.
 TEST_P(AgainstPlainTable, GivesTheSameTable) {
     const Mix& mix = GetParam();
-    std::discrete_distribution<int> kinds{mix.weights.begin(), mix.weights.end()};
+    std::mt19937 engine{20140403};
+    std::discrete_distribution<std::size_t> kinds{
+        mix.enter,           mix.leave,     mix.allocate,        mix.fail,
+        mix.free_a_live_one, mix.free_null, mix.free_an_unknown, mix.freeall};
+    PlainTable plain;
+    int calls = 0;
+    char unknown[16] = {};
+    const auto enter = [&] {
+        if (plain.depth >= mix.deepest) return;
+        const std::string name = "f" + std::to_string(calls++);
+        plain.enter(name);
+        set_ckerr_fun(name.c_str());
+    };
+    const auto leave = [&] { plain.depth -= plain.depth > 0, deccurdep(); };
+    const auto remove = [&](void* block) { plain.remove(block), free_ckerr(block); };
+    const std::function<void()> steps[] = {
+        enter,
+        leave,
+        [&] { plain.add(malloc_ckerr(engine() % 40)); },
+        [&] { plain.add(malloc_ckerr(overflowing)); },
+        [&] { remove(plain.entries.empty() ? nullptr : plain.entries[engine() % plain.entries.size()].block); },
+        [&] { remove(nullptr); },
+        [&] { remove(&unknown[engine() % 16]); },
+        [&] { plain.remove_own(), freeall_ckerr(); }};
     for (int round = 0; round < mix.rounds; ++round) {
-        plain = PlainTable{};
+        plain = {};
         exit_ckerr();
         init_ckerr_locking();
-        for (int i = 0; i < mix.steps; ++i) step(kinds(engine));
+        for (int i = 0; i < mix.steps; ++i) steps[kinds(engine)]();
         errno = 0;
         ASSERT_EQ(test::leak_lines(), plain.leak_lines()) << "round " << round;
-        for (void* block : plain.blocks()) free_ckerr(block);  // tracking is off
+        for (const auto& entry : plain.entries) free_ckerr(entry.block);  // tracking is off
     }
 }
 INSTANTIATE_TEST_SUITE_P(Mixes, AgainstPlainTable,
-                         testing::Values(Mix{"Everything", 300, 200, 6, {20, 18, 40, 5, 20, 3, 2, 2}},
-                                         Mix{"MostlyNull", 300, 120, 5, {20, 17, 10, 30, 8, 3, 1, 4}},
-                                         Mix{"BeyondTheLastSlot", 60, 900, 90, {40, 20, 20, 3, 8, 1, 1, 1}},
-                                         Mix{"MissingLeaves", 100, 200, 70, {30, 5, 40, 5, 20, 3, 2, 2}},
-                                         Mix{"MoreLeaves", 100, 200, 8, {20, 40, 40, 5, 20, 3, 2, 2}},
-                                         Mix{"Growing", 5, 6000, 8, {20, 19, 60, 2, 10, 1, 1, 0.02}}),
+                         testing::Values(Mix{"Everything", 300, 200, 6, 20, 18, 40, 5, 20, 3, 2, 2},
+                                         Mix{"MostlyNull", 300, 120, 5, 20, 17, 10, 30, 8, 3, 1, 4},
+                                         Mix{"BeyondTheLastSlot", 60, 900, 90, 40, 20, 20, 3, 8, 1, 1, 1},
+                                         Mix{"MissingLeaves", 100, 200, 70, 30, 5, 40, 5, 20, 3, 2, 2},
+                                         Mix{"MoreLeaves", 100, 200, 8, 20, 40, 40, 5, 20, 3, 2, 2},
+                                         Mix{"Growing", 5, 6000, 8, 20, 19, 60, 2, 10, 1, 1, 0.02}),
                          [](const auto& row) { return row.param.name; });
 
 // The index at its fullest: every address must be found whatever was deleted beside it.

@@ -58,18 +58,14 @@ struct IntList {
     std::vector<int> read;  // what must have been read, whatever the status
 };
 const IntList kIntLists[] = {
-    {"Braces", "{1 2 3}", 3, 0, {1, 2, 3}},
+    {"Braces", "{ 1 2 3 }", 3, 0, {1, 2, 3}},
     {"NoBraces", "4 5 6", 3, 0, {4, 5, 6}},
     {"MoreThanWanted", "4 5 6", 2, 0, {4, 5}},
     {"TooFew", "{1 2}", 3, 10, {1, 2}},
     {"LoneClosingBrace", "{7 }", 2, 10, {7}},
-    {"BlankAfterTheOpeningBrace", "{ 7 8 }", 2, 0, {7, 8}},
     {"BlankBeforeTheOpeningBrace", " {7}", 1, 10, {}},
-    {"SecondOpeningBrace", "{{7}", 1, 10, {}},
     {"TabsAndRunsOfBlanks", "{1\t \t2   3}", 3, 0, {1, 2, 3}},
-    {"TabsAlone", "{1\t2\t}", 2, 0, {1, 2}},
     {"Signs", "-17 +29", 2, 0, {-17, 29}},
-    {"SignAlone", "17 - 3", 2, 10, {17}},
     {"RestOfAWordIsIgnored", "12abc 3,4 5.9", 3, 0, {12, 3, 5}},
     {"WordStopsTheScan", "12 abc 3", 3, 10, {12}},
     {"LineFeedInsideAWord", "1\n2 3", 2, 0, {1, 3}},
@@ -77,7 +73,6 @@ const IntList kIntLists[] = {
     {"OctalLooks", "010 0x10", 2, 0, {10, 0}},
     {"BeyondTheRange", "2147483648 -2147483649 99999999999999999999", 3, 0, {INT32_MAX, INT32_MIN, INT32_MAX}},
     {"Empty", "", 1, 10, {}},
-    {"EmptyBraces", "{}", 1, 10, {}},
     {"NothingWanted", "x", 0, 0, {}},
     {"LessThanNothingWanted", "x", -3, 0, {}},
 };
@@ -264,10 +259,8 @@ struct StringList {
     bool warns;
 };
 const StringList kStringLists[] = {
-    {"Strings", R"({"ab" "c d" ""})", 3, 0, {"ab", "c d", ""}, false},
-    {"NoSeparators", R"({"ab""c"})", 2, 0, {"ab", "c"}, false},
+    {"Strings", R"({ "{b}""c d " ""})", 3, 0, {"{b}", "c d ", ""}, false},
     {"MoreThanWanted", R"({"ab" "c"})", 1, 0, {"ab"}, false},
-    {"BracesAndBlanksInside", R"({   "{a} " })", 1, 0, {"{a} "}, false},
     {"NoClosingBrace", R"({"ab")", 1, 0, {"ab"}, false},
     {"EarlyBraceReturnsTheCount", R"({"ab" "c"})", 3, 2, {"ab", "c"}, false},
     {"EmptyBracesReturnTheCountToo", "{}", 3, 0, {}, false},

@@ -1,7 +1,6 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
-#include <unistd.h>
 
 #include <array>
 #include <cerrno>
@@ -152,16 +151,6 @@ TEST_F(ProfileStore, FolderIsAnEmptyFileThatCannotBeWritten) {
     EXPECT_EQ(errno, 0);
     EXPECT_EQ(set("", "k", "v"), std::string{"v"});
     EXPECT_EQ(sync(""), 1);
-}
-
-TEST_F(ProfileStore, ReadsAPipe) {
-    std::array<int, 2> ends{};
-    ASSERT_EQ(pipe(ends.data()), 0);
-    const std::string_view text = "[s]\nk = 17.3\n";
-    ASSERT_EQ(write(ends[1], text.data(), text.size()), static_cast<ssize_t>(text.size()));
-    close(ends[1]);
-    EXPECT_STREQ(get("/dev/fd/" + std::to_string(ends[0]), "k"), "17.3");
-    close(ends[0]);
 }
 
 TEST_F(ProfileStore, EndlessDeviceIsEmptyAndNotReplaced) {

@@ -110,12 +110,8 @@ TEST(Time, FollowsTheCalendar) {
         ASSERT_EQ(fields.day_of_year, (day - chr::sys_days{date.year() / 1 / 1}).count() + 1);
         ASSERT_EQ(fields.month, static_cast<int>(unsigned{date.month()}));
     }
-}
-
-TEST(Time, CountsBackToTheFirstYears) {
     for (int year = 1; year < 1985; ++year)
-        EXPECT_EQ(ascii2sec85(("29-DEC-" + std::to_string(year)).c_str()), sec85_of(chr::year{year} / 12 / 29))
-            << year;
+        ASSERT_EQ(ascii2sec85(("29-DEC-" + std::to_string(year)).c_str()), sec85_of(chr::year{year} / 12 / 29));
 }
 
 TEST(Time, RefusesWhatTheTextCannotHold) {
