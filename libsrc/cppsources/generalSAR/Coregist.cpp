@@ -10,6 +10,7 @@
 namespace {
 
 constexpr const char* kSource = "Coregist";
+constexpr const char* kNoInverse = "The mapping has no inverse there";
 
 using Obj = Coregist;
 constexpr quo::FieldTable kTable{
@@ -126,15 +127,16 @@ int Coregist::evaluateMAtime(double slaveRange, double slaveAzimuth, double* mas
     quo::CallFrame frame{"Coregist::evaluateMAtime", kSource};
     const double range = slaveRange - RgFit[3], azimuth = slaveAzimuth - AzFit[3];
     const double right = AzFit[2] * range - RgFit[2] * azimuth;
+    const double square = linear_square_ + 4.0 * quadratic_ * right;
+    if (!(square >= 0.0)) return frame.fail(QUO_NUMERIC, kNoInverse);
     // The root as a quotient, which neither cancels nor divides by a quadratic term that is 0.
-    const double root = std::sqrt(linear_square_ + 4.0 * quadratic_ * right);
+    const double root = std::sqrt(square);
     const double dr = 2.0 * right / (linear_ + std::copysign(root, linear_));
     // da from the equation that depends on it more.
     const bool by_azimuth = std::abs(AzFit[2]) >= std::abs(RgFit[2]);
     const double(&fit)[4] = by_azimuth ? AzFit : RgFit;
     const double da = ((by_azimuth ? azimuth : range) - (fit[0] * dr + fit[1]) * dr) / fit[2];
-    if (!std::isfinite(dr) || !std::isfinite(da))
-        return frame.fail(QUO_NUMERIC, "The mapping has no inverse there");
+    if (!std::isfinite(dr) || !std::isfinite(da)) return frame.fail(QUO_NUMERIC, kNoInverse);
     *masterRange = trg0 + dr;
     *masterAzimuth = taz0 + da;
     return frame.success();
