@@ -20,11 +20,13 @@ public:
     // Sums of so many neighbouring columns are carried in registers.
     static constexpr int kPanel = 8;
     using Pair __attribute__((vector_size(16))) = double;
+    using LoosePair __attribute__((vector_size(16), aligned(8), may_alias)) = double;
     // Points that stay in the nearest cache while all pairs of columns are summed.
     static constexpr std::size_t kBlock = 256;
 
-    DesignMatrix(const int* fitted, int count, int points)
-        : fitted_{fitted},
+    /** `order`: the numbers of the fitted parameters, `count` of them, then those of the held ones. */
+    DesignMatrix(const int* order, int count, int points)
+        : order_{order},
           count_{count},
           stride_{(count + kPanel) / kPanel * kPanel},
           rows_{(quo::Checked<std::size_t>{points} * stride_).value().value_or(kTooMany)},
@@ -39,14 +41,8 @@ public:
             points.at(k, values, ma);
             double rest = points.y[k];
             double* row = row_of(k);
-            int next = 0;
-            for (int j = 1; j <= ma; ++j) {
-                if (next < count_ && fitted_[next] == j) {
-                    row[next++] = values[j];
-                } else {
-                    rest -= a[j] * values[j];
-                }
-            }
+            for (int i = 0; i < count_; ++i) row[i] = values[order_[i]];
+            for (int i = count_; i < ma; ++i) rest -= a[order_[i]] * values[order_[i]];
             row[count_] = rest;
             weights_[static_cast<std::size_t>(k)] = 1.0 / (points.sig[k] * points.sig[k]);
         }
@@ -57,12 +53,10 @@ public:
         const std::size_t points = weights_.size();
         for (std::size_t first = 0; first < points; first += kBlock) {
             const std::size_t last = std::min(first + kBlock, points);
-            for (int i = 0; i < count_; i += 2) {
-                for (int panel = 0; panel < stride_; panel += kPanel) add_panel(first, last, i, panel);
-            }
+            for (int i = 0; i < count_; i += 2) add_rows(first, last, i);
         }
         for (int i = 0; i < count_; ++i) {
-            std::copy_n(sums_of(i), count_, left[i + 1] + 1);
+            for (int j = i; j < count_; ++j) left[i + 1][j + 1] = left[j + 1][i + 1] = sums_of(i)[j];
             right[i + 1][1] = sums_of(i)[count_];
         }
     }
@@ -85,20 +79,40 @@ private:
     [[nodiscard]] double* row_of(std::ptrdiff_t k) { return rows_.data() + k * stride_; }
     [[nodiscard]] const double* row_of(std::ptrdiff_t k) const { return rows_.data() + k * stride_; }
 
+    // The sums are symmetric: columns left of the diagonal are left out.
+    void add_rows(std::size_t first, std::size_t last, int i) {
+        const int diagonal = i / kPanel * kPanel;
+        switch ((i - diagonal) / 2) {
+            case 0:
+                add_panel<0>(first, last, i, diagonal);
+                break;
+            case 1:
+                add_panel<1>(first, last, i, diagonal);
+                break;
+            case 2:
+                add_panel<2>(first, last, i, diagonal);
+                break;
+            default:
+                add_panel<3>(first, last, i, diagonal);
+        }
+        for (int panel = diagonal + kPanel; panel < stride_; panel += kPanel) add_panel<0>(first, last, i, panel);
+    }
+
     // Two rows of sums at a time, points in their order: enough independent additions to hide their latency.
     // Explicit pairs, because left to itself the compiler unrolls the points and spills the sums.
-    void add_panel(std::size_t first, std::size_t last, int i, int panel) {
+    template <int FirstPair>
+    [[gnu::noinline]] void add_panel(std::size_t first, std::size_t last, int i, int panel) {
         Pair upper[kPanel / 2], lower[kPanel / 2];
         std::memcpy(upper, sums_of(i) + panel, sizeof upper);
         std::memcpy(lower, sums_of(i + 1) + panel, sizeof lower);
         for (std::size_t k = first; k < last; ++k) {
             const double* row = row_of(static_cast<std::ptrdiff_t>(k));
             const double weight = weights_[k];
-            Pair values[kPanel / 2];
-            std::memcpy(values, row + panel, sizeof values);
-            for (int j = 0; j < kPanel / 2; ++j) {
-                upper[j] += values[j] * (row[i] * weight);
-                lower[j] += values[j] * (row[i + 1] * weight);
+            const auto* values = reinterpret_cast<const LoosePair*>(row + panel);
+            const double weighted = row[i] * weight, weighted_next = row[i + 1] * weight;
+            for (int j = FirstPair; j < kPanel / 2; ++j) {
+                upper[j] += values[j] * weighted;
+                lower[j] += values[j] * weighted_next;
             }
         }
         std::memcpy(sums_of(i) + panel, upper, sizeof upper);
@@ -108,7 +122,7 @@ private:
     // One row more than there are parameters, so that rows can be summed in pairs.
     [[nodiscard]] double* sums_of(int i) { return sums_.data() + static_cast<std::ptrdiff_t>(i) * stride_; }
 
-    const int* fitted_;
+    const int* order_;
     int count_, stride_;
     quo::TrackedBuffer<double> rows_, weights_, sums_;
 };
@@ -136,26 +150,29 @@ int fit_by_normal_equations(const FitName& name, const WeightedPoints& points, d
     quo::CallFrame frame{name.function, quo::kMatrixSource};
     if (points.n < 1) return frame.fail(QUO_NUMERIC, "No points to be fitted");
     const auto parameters = static_cast<std::size_t>(std::max(ma, 0));
-    quo::TrackedBuffer<int> fitted{parameters};
+    quo::TrackedBuffer<int> order{parameters};  // the fitted ones, then the held ones
     quo::TrackedBuffer<double> values{parameters + 1};
-    if (!fitted || !values) return frame.silent(QUO_NO_MEMORY);
+    if (!order || !values) return frame.silent(QUO_NO_MEMORY);
     int count = 0;
     for (int j = 1; j <= ma; ++j) {
-        if (ia[j] != 0) fitted[static_cast<std::size_t>(count++)] = j;
+        if (ia[j] != 0) order[static_cast<std::size_t>(count++)] = j;
+    }
+    for (int j = 1, held = count; j <= ma; ++j) {
+        if (ia[j] == 0) order[static_cast<std::size_t>(held++)] = j;
     }
     if (count == 0) {
         quo::say(name.nothing_to_fit);
         return frame.silent(QUO_NUMERIC);
     }
 
-    DesignMatrix design{fitted.data(), count, points.n};
+    DesignMatrix design{order.data(), count, points.n};
     const WorkMatrix solution{count, 1};
     if (!design.has_memory() || !solution.get()) return frame.silent(QUO_NO_MEMORY);
     design.fill(points, a, ma, values.data());
     design.sum_up(covar, solution.get());
     if (const int status = gaussj(covar, count, solution.get(), 1)) return frame.callee(status);
 
-    for (int i = 0; i < count; ++i) a[fitted[static_cast<std::size_t>(i)]] = solution.get()[i + 1][1];
+    for (int i = 0; i < count; ++i) a[order[static_cast<std::size_t>(i)]] = solution.get()[i + 1][1];
     *chisq = design.chi_square(solution.get());
     covsrt(covar, ma, ia, count);
     return frame.success();
