@@ -48,30 +48,13 @@ INSTANTIATE_TYPED_TEST_SUITE_P(Roi, HeaderObject, RoiCases, CaseName);
 }
 namespace {
 
-// Only Samples decides: a file with nothing else is a region.
-TEST(RoiFile, IsReadWhenItsLastKeyIs) {
-    const test::TemporaryFolder folder;
-    const std::string only_samples = folder.file("only_samples.par"), all_but = folder.file("all_but.par");
-    test::write_text(only_samples, "[ROI]\nSamples = 17\n");
-    test::write_text(all_but, "[ROI]\nSlowStartTime = 3.5\nFastStartTime = 2.5\nLines = 13\n");
-    ROI_Obj roi;
-    EXPECT_EQ(roi.read_roi(only_samples.c_str(), "ROI"), 0);
-    EXPECT_EQ(roi.Samples, 17);
-    EXPECT_EQ(roi.read_roi(all_but.c_str(), "ROI"), 1);
-    EXPECT_EQ(roi.Samples, 17);
-    EXPECT_EQ(roi.Lines, 13);
-    EXPECT_EQ(roi.SlowStartTime, 3.5);
-}
-
-TEST(FileRoi, ReadsTheRegionThatItsFileHolds) {
+TEST(FileRoi, ReadsTheRegionThatItsFileHoldsAndNeverCutsAName) {
     const test::Report report;
-    const std::string file = report.file("regions.xml");
+    const std::string file = report.file("regions.xml"), longest(511, 'a'), too_long(512, 'b');
     ROI_Obj first, second;
     test::fill_fields(first, 1);
     test::fill_fields(second, 2);
-    EXPECT_EQ(first.write_roi(file.c_str(), "First"), 0);
-    EXPECT_EQ(second.write_roi(file.c_str(), "Second"), 0);
-
+    EXPECT_EQ(first.write_roi(file.c_str(), "First") + second.write_roi(file.c_str(), "Second"), 0);
     FileROI_Obj roi{file.c_str(), "Second"};
     EXPECT_EQ(roi.read_roi(), 0);
     EXPECT_THAT(test::differing_fields(roi, second), testing::IsEmpty());
@@ -79,18 +62,13 @@ TEST(FileRoi, ReadsTheRegionThatItsFileHolds) {
     EXPECT_EQ(roi.read_roi(), 0);
     EXPECT_THAT(test::differing_fields(roi, first), testing::IsEmpty());
     EXPECT_EQ(report.entries("ERROR").size(), 0U);
-}
 
-TEST(FileRoi, FailsWithoutAFileAndNeverCutsAName) {
-    const test::Report report;
-    FileROI_Obj roi;
-    EXPECT_EQ(roi.read_roi(), 1);
-    EXPECT_EQ(roi.SetFile(std::string(511, 'a').c_str(), "ROI"), 0);
-    EXPECT_EQ(roi.SetFile(std::string(512, 'b').c_str(), "ROI"), 1);
-    EXPECT_EQ(roi.SetFile("b", std::string(512, 'b').c_str()), 1);
-    EXPECT_EQ(roi.FileName, std::string(511, 'a'));
+    EXPECT_EQ(FileROI_Obj{}.read_roi(), 1);
+    EXPECT_EQ(roi.SetFile(longest.c_str(), "ROI"), 0);
+    EXPECT_EQ(roi.SetFile(too_long.c_str(), "ROI"), 1);
+    EXPECT_EQ(roi.SetFile("b", too_long.c_str()), 1);
+    EXPECT_EQ(roi.FileName, longest);
     EXPECT_STREQ(roi.SectionName, "ROI");
-    EXPECT_EQ(roi.read_roi(), 1);
     EXPECT_EQ(report.entries("ERROR").size(), 3U);
 }
 
