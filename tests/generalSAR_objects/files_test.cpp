@@ -17,8 +17,7 @@ namespace {
 
 using testing::ElementsAre, testing::IsEmpty, testing::Not;
 
-// --- the reference chirp as a raster
-// --------------------------------------------------------------------------------
+// --- the reference chirp as a raster --------------------------------------------------------------------------
 
 SARPulse_Obj& make_pulse(SARPulse_Obj& pulse) {
     pulse.PulseLength = 37.12e-6;
@@ -64,8 +63,7 @@ TEST(WriteChirp, PassesOnWhatFails) {
     test::fail_every_allocation([&] { return pulse.writeChirp(file.c_str()); });
 }
 
-// --- droop gains
-// ----------------------------------------------------------------------------------------------------
+// --- droop gains ----------------------------------------------------------------------------------------------
 
 constexpr std::size_t kData = 171648, kRecords = 171232;
 

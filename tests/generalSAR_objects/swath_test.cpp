@@ -1,12 +1,17 @@
 #include "quo_base/swath.h"
 
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <filesystem>
 #include <string>
 #include <utility>
 #include <vector>
 
 #include "annex_files.h"
 #include "quo_base/gen_utils.h"
-#include "support/header_object_suite.h"
+#include "support/diagnostics.h"
+#include "support/fields.h"
 #include "support/raster.h"
 
 namespace {
@@ -14,29 +19,26 @@ namespace {
 using test::real, test::whole;
 using testing::Each, testing::ElementsAre, testing::IsEmpty;
 
-struct Swath : test::HeaderCase {
-    using Object = SwathInfo;
-    static constexpr const char* kSection = "SwathInfo";
-    static constexpr test::FieldRow kRows[] = {
-        whole("Rank", -999),
-        real("Rgate_bias"),
-        whole("Echoes_per_burst", -999),
-        whole("Lines_per_burst", -999),
-        whole("Bursts", -999),
-        whole("Order", -999),
-        real("Acquisition_Start_Time"),
-        whole("Swst_changes", -999),
-        real("ProcessorGain", 1.0),
-        real("NoisePower"),
-        real("ChirpPower"),
-    };
+constexpr const char* kSection = "SwathInfo";
+constexpr test::FieldRow kRows[] = {
+    whole("Rank", -999),
+    real("Rgate_bias"),
+    whole("Echoes_per_burst", -999),
+    whole("Lines_per_burst", -999),
+    whole("Bursts", -999),
+    whole("Order", -999),
+    real("Acquisition_Start_Time"),
+    whole("Swst_changes", -999),
+    real("ProcessorGain", 1.0),
+    real("NoisePower"),
+    real("ChirpPower"),
 };
 
 /** The swath as a parameter file, `changes` values under Swst_changes_bursts. */
 std::string profile(SwathInfo& swath, std::int32_t changes, const std::string& values) {
     test::fill_fields(swath);
     swath.Swst_changes = changes;
-    return test::profile_text(swath, Swath::kSection, Swath::kRows) + values;
+    return test::profile_text(swath, kSection, kRows) + values;
 }
 
 class SwathFile : public testing::Test {
@@ -52,12 +54,12 @@ protected:
 
 TEST_F(SwathFile, ComesBackFromItsSection) {
     SwathInfo source, target;
-    test::expect_fields(source, Swath::kRows);
+    test::expect_fields(source, kRows);
     test::fill_fields(source);
     source.Swst_changes = 3;
     const std::string name = report_.file("swath.xml");
     ASSERT_EQ(source.writehdr(name.c_str()), 0);
-    EXPECT_EQ(test::child_names(test::read_text(name), "SwathInfo"), test::field_names(source));
+    EXPECT_EQ(test::child_names(test::read_text(name), kSection), test::field_names(source));
     ASSERT_EQ(target.readhdr(name.c_str()), 0);
     EXPECT_THAT(test::differing_fields(source, target), IsEmpty());
     EXPECT_THAT(target.Swst_changes_bursts, ElementsAre(0, 0, 0));
@@ -77,8 +79,8 @@ TEST_F(SwathFile, RefusesMissingKeys) {
     std::vector<std::string> contents{profile(source, 3, ""),
                                       profile(source, 3, "Swst_changes_bursts = {17 29}\n")};
     source.Swst_changes = 0;
-    for (const test::FieldRow& row : Swath::kRows)
-        contents.push_back(test::profile_text(source, "SwathInfo", Swath::kRows, row.key));
+    for (const test::FieldRow& row : kRows)
+        contents.push_back(test::profile_text(source, kSection, kRows, row.key));
     for (const std::string& content : contents) EXPECT_EQ(target.readhdr(file(content).c_str()), 1) << content;
 }
 
@@ -112,8 +114,7 @@ TEST_F(SwathFile, ClonesItsArrays) {
     EXPECT_THAT(source.Swst_changes_bursts, ElementsAre(17, 29));
 }
 
-// --- burst times
-// ----------------------------------------------------------------------------------------------------
+// --- burst times ----------------------------------------------------------------------------------------------
 
 class BurstTimes : public testing::Test {
 protected:
@@ -207,8 +208,7 @@ TEST_F(BurstTimes, PassOnWhatFails) {
         EXPECT_EQ(SwathInfo{}.readBurstTimes(name), 1);
 }
 
-// --- the antenna pattern
-// --------------------------------------------------------------------------------------------
+// --- the antenna pattern --------------------------------------------------------------------------------------
 
 class Pattern : public testing::Test {
 protected:
@@ -332,8 +332,7 @@ TEST_F(Pattern, FailsWithoutMemory) {
     });
 }
 
-// --- patterns of an annex file
-// --------------------------------------------------------------------------------------
+// --- patterns of an annex file --------------------------------------------------------------------------------
 
 float annex_value(int record, int i) {
     return 17.25F * static_cast<float>(record) + 0.0625F * static_cast<float>(i);
