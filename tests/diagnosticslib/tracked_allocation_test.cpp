@@ -196,14 +196,6 @@ TEST_F(Tracked, FullTableFailsTheAllocationWithAnErrorEntry) {
     EXPECT_EQ(report.entries("ERROR")[1].function, "calloc_ckerr");
 }
 
-TEST_F(Tracked, FullTableIsNoLimitWithoutTracking) {
-    exit_ckerr();
-    std::vector<void*> blocks(kCapacity + 10);
-    for (void*& block : blocks) block = malloc_ckerr(1);
-    EXPECT_EQ(std::count(blocks.begin(), blocks.end(), nullptr), 0);
-    for (void* block : blocks) free_ckerr(block);
-}
-
 // ---- Against a plain model
 
 /** The table as it is described: a list that is searched from the front, with all counters in every entry. */

@@ -123,12 +123,16 @@ TEST_F(ProfileAccess, ReadsEveryTypeToItsBounds) {
 
 /* ---- Writing numbers ---- */
 
-TEST_F(ProfileAccess, WritesScalarsAndLists) {
+using Writer = std::function<int(const char* file)>;
+
+TEST_F(ProfileAccess, WritesEveryForm) {
     const int ints[] = {1, -2, INT32_MIN};
     const int64_t wide[] = {INT64_MAX, INT64_MIN};
     const float floats[] = {1.0F / 3.0F, 16777216.0F, 1e-10F};
     const double doubles[] = {0.1, 2.0, 1.0 / 3.0, -std::numeric_limits<double>::infinity()};
-    const std::pair<std::function<int(const char*)>, const char*> rows[] = {
+    const double matrix[] = {11.5, 21.5, 12.5, 22.5, 13.5, 23.5};
+    const char* const strings[] = {"11", "21", "31", "12", " 22 ", ""};
+    const std::pair<Writer, const char*> rows[] = {
         {[&](auto file) { return WriteMyProfileIntArray(kSection, kKey, ints, 3, file); }, "{1 -2 -2147483648}"},
         {[&](auto file) { return WriteMyProfileLongArray(kSection, kKey, ints, 2, file); }, "{1 -2}"},
         {[&](auto file) { return WriteMyProfileInt64Array(kSection, kKey, wide, 2, file); },
@@ -137,6 +141,15 @@ TEST_F(ProfileAccess, WritesScalarsAndLists) {
          "{0.3333333 1.677722e+07 1e-10}"},
         {[&](auto file) { return WriteProfileDoubleArray(kSection, kKey, doubles, 4, file); },
          "{0.1 2 0.333333333333333 -inf}"},
+        // Matrices stand column after column in memory, row after row in the value.
+        {[&](auto file) { return WriteMyProfileDoubleMatrix(kSection, kKey, matrix, 2, 3, file); },
+         "{11.5 12.5 13.5}\n\t{21.5 22.5 23.5}"},
+        {[&](auto file) { return WriteMyProfileStringMatrix(kSection, kKey, strings, 3, 2, file); },
+         "{\"11\" \"12\"}\n\t{\"21\" \" 22 \"}\n\t{\"31\" \"\"}"},
+        {[&](auto file) { return WriteMyProfileStringArray(kSection, kKey, strings + 3, 3, file); },
+         R"({"12" " 22 " ""})"},
+        {[&](auto file) { return WriteMyProfileString(kSection, kKey, "  a \"b\" {c}", file); }, R"(  a "b" {c})"},
+        {[&](auto file) { return WriteMyProfileStringQuote(kSection, kKey, " a b ", file); }, R"(" a b ")"},
         {[&](auto file) { return WriteMyProfileInt(kSection, kKey, -17, file); }, "-17"},
         {[&](auto file) { return WriteMyProfileInt64(kSection, kKey, INT64_MIN, file); }, "-9223372036854775808"},
         {[&](auto file) { return WriteMyProfileDouble(kSection, kKey, 803457.3, file); }, "803457.3"},
@@ -149,16 +162,6 @@ TEST_F(ProfileAccess, WritesScalarsAndLists) {
         EXPECT_EQ(write(file()), 0);
         EXPECT_STREQ(stored(), value);
     }
-}
-
-// Column after column in memory, row after row in the file.
-TEST_F(ProfileAccess, WritesMatricesRowByRow) {
-    const std::array<double, 6> values{11.5, 21.5, 12.5, 22.5, 13.5, 23.5};
-    EXPECT_EQ(WriteMyProfileDoubleMatrix(kSection, kKey, values.data(), 2, 3, file()), 0);
-    EXPECT_STREQ(stored(), "{11.5 12.5 13.5}\n\t{21.5 22.5 23.5}");
-    const std::array<const char*, 6> strings{"11", "21", "31", "12", " 22 ", ""};
-    EXPECT_EQ(WriteMyProfileStringMatrix(kSection, kKey, strings.data(), 3, 2, file()), 0);
-    EXPECT_STREQ(stored(), "{\"11\" \"12\"}\n\t{\"21\" \" 22 \"}\n\t{\"31\" \"\"}");
 }
 
 // Doubles go the way that the tests of the number texts cover; floats are narrowed on it.
@@ -242,15 +245,6 @@ TEST_F(ProfileAccess, CopiesStringsWithinTheirRoom) {
     EXPECT_EQ(report_.entries().size(), 0U);
 }
 
-TEST_F(ProfileAccess, WritesStringsAsTheyStand) {
-    EXPECT_EQ(WriteMyProfileString(kSection, kKey, "  a \"b\" {c}", file()), 0);
-    EXPECT_STREQ(stored(), "  a \"b\" {c}");
-    EXPECT_EQ(WriteMyProfileStringQuote(kSection, kKey, " a b ", file()), 0);
-    char text[16];
-    EXPECT_EQ(GetMyProfileString(kSection, kKey, text, 16, file()), 0);
-    EXPECT_STREQ(text, "\" a b \"");
-}
-
 struct StringList {
     const char* name;
     const char* value;
@@ -301,19 +295,6 @@ TEST_F(ProfileAccess, StringListsAreCutToTheRoomPerString) {
         EXPECT_EQ(GetMyProfileStringArray(kSection, kKey, strings, 2, room, file()), 0);
         EXPECT_EQ(memory, expected) << room;
     }
-}
-
-TEST_F(ProfileAccess, StringListsSurviveTheFile) {
-    const char* const written[] = {"first", "", " [third] = {x} "};
-    EXPECT_EQ(WriteMyProfileStringArray(kSection, kKey, written, 3, file()), 0);
-    EXPECT_STREQ(stored(), R"({"first" "" " [third] = {x} "})");
-    EXPECT_EQ(SyncProfile(file()), 0);
-    FreeProfile(file());
-
-    char rooms[3][32];
-    char* const strings[] = {rooms[0], rooms[1], rooms[2]};
-    EXPECT_EQ(GetMyProfileStringArray(kSection, kKey, strings, 3, 32, file()), 0);
-    for (int i = 0; i < 3; ++i) EXPECT_STREQ(strings[i], written[i]);
 }
 
 }  // namespace

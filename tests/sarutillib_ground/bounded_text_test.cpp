@@ -4,6 +4,7 @@
 
 #include <cerrno>
 #include <string>
+#include <utility>
 
 namespace {
 
@@ -43,13 +44,12 @@ TEST(CopyBounded, TakesBytesThatAreNoUtf8AndATextInsideItsTarget) {
     EXPECT_STREQ(inside, "nge_time");
 }
 
-TEST(FormatBounded, LeavesErrnoAlone) {
+TEST(FormatBounded, GivesNoTextAndKeepsErrnoWhenItCannotFormat) {
     char to[16];
     errno = ERANGE;
     EXPECT_EQ(quo::format_bounded(to, sizeof to, "%ls", L"\xDC00"), 0U);  // no character of any encoding
     EXPECT_STREQ(to, "");
-    EXPECT_EQ(errno, ERANGE);
-    errno = 0;
+    EXPECT_EQ(std::exchange(errno, 0), ERANGE);
 }
 
 }  // namespace
