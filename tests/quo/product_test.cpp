@@ -45,8 +45,8 @@ TEST_F(ProductVerbs, InfoKnowsEveryBundledScene) {
         }
         const auto facts = nlohmann::json::parse(json.out);
         EXPECT_EQ(facts["corners"].size(), 4U);
-        EXPECT_GT(facts["PRF"].get<double>(), 1.0);
-        EXPECT_EQ(facts["look side"], scene.find("left") != std::string::npos ? "left" : "right");
+        EXPECT_GT(facts["prf_hz"].get<double>(), 1.0);
+        EXPECT_EQ(facts["look_side"], scene.find("left") != std::string::npos ? "left" : "right");
     }
 }
 
@@ -68,18 +68,47 @@ TEST_F(ProductVerbs, ValidateFindsWhatDoesNotFit) {
     const Spoil rows[] = {
         {"SamplingConstants/lambda_m", "0.06", 1, "error  SamplingConstants/lambda_m"},
         {"SamplingConstants/prf_hz", "-5", 1, "error  SamplingConstants/prf_hz"},
-        {"SamplingConstants/frg_hz", "nan", 1, "error  SamplingConstants/frg_hz"},
+        {"SamplingConstants/frg_hz", "nan", 1, "error  SamplingConstants/frg_hz  \"nan\" is no finite number"},
         {"DataSetInfo/RangeLooks", "5000", 1, "error  DataSetInfo/RangeLooks  5000 lies outside 1 to 1000"},
         {"ROI/Lines", "17", 1, "error  ROI/SlowTimeLength"},
         {"ROI/FastTimeDelta", "0", 1, "error  ROI/FastTimeLength"},
         {"ROI/SlowStartTime", "5", 1, "error  StateVectorData/t0SV_s  the scene reaches"},
         {"StateVectorData/t0SV_s", "17", 1, "the scene reaches"},
+        {"StateVectorData/dtSV_s", "0", 1, "error  StateVectorData/"},
+        {"StateVectorData/nSV_n", "4", 1, "4 state vectors, at least 5 are needed"},
     };
     for (const Spoil& row : rows) {
         SCOPED_TRACE(row.field);
         const std::string header = copy_of_scene();
         set(header, row.field, row.value);
         expect_finding(header, row.exit_status, row.finding);
+    }
+}
+
+// What only the document tells: a field that is gone, a value too few, a section that stands twice.
+TEST_F(ProductVerbs, ValidateLooksAtTheDocument) {
+    struct Edit {
+        const char *from, *to;
+        int exit_status;
+        const char* finding;
+    };
+    const Edit rows[] = {
+        {"<Lines>12236</Lines>", "", 1, "error  ROI/Lines  is missing"},
+        {"<val N=\"1\">5636962.746301</val>", "", 1, "error  StateVectorData/pSV_m  has 47 values, not 48"},
+        {"<val N=\"1\">5636962.746301</val>", "<val N=\"1\">far</val>", 1, "\"far\" is no finite number"},
+        {"<ROI>", "<ROI/><ROI>", 0, "warning  ROI/-  stands 2 times"},
+        {"<Channel Number=\"1\">", "<Channel Number=\"2\">", 1, "holds no object"},
+    };
+    for (const Edit& row : rows) {
+        SCOPED_TRACE(row.finding);
+        const std::string header = copy_of_scene();
+        std::string text = test::read_text(header);
+        const std::size_t at = text.find(row.from);
+        ASSERT_NE(at, std::string::npos);
+        test::write_text(header, text.replace(at, std::string_view{row.from}.size(), row.to));
+        const test::Finished finished = test::quo({"validate", header});
+        EXPECT_EQ(finished.exit_status, row.exit_status);
+        EXPECT_THAT(finished.out + finished.err, HasSubstr(row.finding));
     }
 }
 
@@ -107,7 +136,7 @@ TEST_F(ProductVerbs, GetAndSetTouchOneFieldOnly) {
     EXPECT_EQ(test::read_text(header), expected);
 
     const test::Finished vectors = test::quo({"get", header, "StateVectorData/t0SV_s", "--json"});
-    EXPECT_EQ(nlohmann::json::parse(vectors.out)["value"], "1167930296.781409");
+    EXPECT_EQ(nlohmann::json::parse(vectors.out)["value"], 1167930296.781409);
     ASSERT_EQ(test::quo({"set", header, "SamplingConstants/list", "1", "2.5", "-3", "--create"}).exit_status, 0);
     EXPECT_EQ(test::quo({"get", header, "SamplingConstants/list"}).out, "1\n2.5\n-3\n");
     ASSERT_EQ(test::quo({"set", header, "SamplingConstants/list", "7", "8"}).exit_status, 0);
@@ -119,6 +148,8 @@ TEST_F(ProductVerbs, GetAndSetRefuseWhatIsNotThere) {
     const std::string header = copy_of_scene(), before = test::read_text(header);
     EXPECT_EQ(test::quo({"set", header, "SamplingConstants/unknown", "1"}).exit_status, 1);
     EXPECT_EQ(test::quo({"get", header, "SamplingConstants/unknown"}).exit_status, 1);
+    EXPECT_EQ(test::quo({"get", header, "SamplingConstants"}).exit_status, 2) << "a section is no field";
+    EXPECT_EQ(test::quo({"set", header, "SamplingConstants/prf_hz", "fast"}).exit_status, 2) << "no number";
     EXPECT_EQ(test::read_text(header), before);
     EXPECT_EQ(test::quo({"set", folder_.file("none.xml"), "A/b", "1"}).exit_status, 1);
     EXPECT_FALSE(std::filesystem::exists(folder_.file("none.xml")));

@@ -3,6 +3,7 @@
 
 #include <fcntl.h>
 #include <spawn.h>
+#include <sys/resource.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -24,6 +25,7 @@ struct Finished {
     int exit_status = -1;  // -1 where a signal ended it
     int signal = 0;
     std::string out, err;
+    long peak_kib = 0;  // the most memory it held
 
     [[nodiscard]] std::vector<std::string> messages() const {
         std::vector<std::string> lines;
@@ -33,17 +35,23 @@ struct Finished {
     }
 };
 
-/** A child process whose standard streams are files. */
+/** A child process whose standard streams are files, the error stream another one where it is named. */
 class Child {
 public:
-    Child(const std::string& program, std::vector<std::string> arguments, std::string_view input = "") {
+    Child(const std::string& program, std::vector<std::string> arguments, std::string_view input = "",
+          const char* error_stream = nullptr)
+        : errors_{error_stream != nullptr ? error_stream : folder_.file("err")} {
         write_text(folder_.file("in"), input);
+        write_text(folder_.file("err"), "");
         start(program, std::move(arguments), folder_.file("in"));
     }
     Finished wait() {
         int status = 0;
-        if (waitpid(id_, &status, 0) != id_) throw std::runtime_error("the child is lost");
-        Finished finished{.out = read_text(folder_.file("out")), .err = read_text(folder_.file("err"))};
+        struct rusage used {};
+        if (wait4(id_, &status, 0, &used) != id_) throw std::runtime_error("the child is lost");
+        Finished finished{.out = read_text(folder_.file("out")),
+                          .err = read_text(folder_.file("err")),
+                          .peak_kib = used.ru_maxrss};
         if (WIFEXITED(status)) finished.exit_status = WEXITSTATUS(status);
         if (WIFSIGNALED(status)) finished.signal = WTERMSIG(status);
         return finished;
@@ -62,13 +70,14 @@ private:
         posix_spawn_file_actions_addopen(&actions, 0, input.c_str(), O_RDONLY, 0);
         constexpr int kNew = O_WRONLY | O_CREAT | O_TRUNC;
         posix_spawn_file_actions_addopen(&actions, 1, folder_.file("out").c_str(), kNew, 0600);
-        posix_spawn_file_actions_addopen(&actions, 2, folder_.file("err").c_str(), kNew, 0600);
+        posix_spawn_file_actions_addopen(&actions, 2, errors_.c_str(), kNew, 0600);
         const int status = posix_spawn(&id_, program.c_str(), &actions, nullptr, pointers.data(), environ);
         posix_spawn_file_actions_destroy(&actions);
         if (status != 0) throw std::runtime_error("cannot start " + program);
     }
 
     TemporaryFolder folder_;
+    std::string errors_;
     pid_t id_ = -1;
 };
 

@@ -1,3 +1,4 @@
+#include <algorithm>
 #include <complex>
 #include <memory>
 #include <vector>
@@ -13,117 +14,107 @@ namespace {
 
 struct ConvertOptions {
     std::string in, out, type, order, lines = ":", samples = ":", prefix = "keep";
+    bool waitbar = false;
 };
 
-/** The part of a raster that is copied, block by block. */
-class Conversion {
+/** The description of the raster that the options ask for. */
+class Wanted : public RasterDescription {
 public:
-    Conversion(const ConvertOptions& options, const DataFile& description)
-        : name_{options.in},
-          in_{options.in.c_str()},
-          lines_{cut_of(options.lines, description.NrOfLinesPerImage, "--lines")},
-          samples_{cut_of(options.samples, description.NrOfPixelsPerLine, "--samples")},
-          out_{options.out, description} {
-        in_.copyDescription(description);
-        BufferFile& out = out_.file();
-        out.HeaderOffset = 0;
-        out.NrOfLinesPerImage = lines_.count();
-        out.NrOfPixelsPerLine = samples_.count();
-        if (!options.type.empty()) out.CellType = type_of(options.type);
-        if (!options.order.empty()) out.ByteOrder = options.order == "m" ? 1 : 0;
-        if (options.prefix == "drop") out.RowPrefix = 0;
-        if (in_.is_complex() != 0 && out.is_complex() == 0) {
-            throw WrongUse("--type " + type_name(out.CellType) + ": complex samples do not become real ones");
+    Wanted(const ConvertOptions& options, const RasterDescription& in, const Cut& lines, const Cut& samples) {
+        copyDescription(in);
+        HeaderOffset = 0;
+        NrOfLinesPerImage = lines.count();
+        NrOfPixelsPerLine = samples.count();
+        if (!options.type.empty()) CellType = type_of(options.type);
+        if (!options.order.empty()) ByteOrder = options.order == "m" ? 1 : 0;
+        if (options.prefix == "drop") RowPrefix = 0;
+        if (in.is_complex() != 0 && is_complex() == 0) {
+            throw WrongUse("--type " + type_name(CellType) + ": complex samples do not become real ones");
         }
     }
+};
 
-    void run() {
-        in_.open(BufferFile::READ);
-        if (!in_.is_open()) throw Failure(name_ + ": cannot be opened");
-        out_.open();
-        const int per_block = block_lines(std::int64_t{samples_.count()} * 16, lines_.count());
-        Progress progress{Progress::Unit::kBytes};
-        const std::int64_t bytes_per_line = std::int64_t{samples_.count()} * out_.file().element_sizeof();
-        for (int done = 0; done < lines_.count(); done += per_block) {
+/** The part of a raster that is copied, tile by tile. */
+class Conversion {
+public:
+    Conversion(const ConvertOptions& options, const RasterDescription& description)
+        : lines_{cut_of(options.lines, description.NrOfLinesPerImage, "--lines")},
+          samples_{cut_of(options.samples, description.NrOfPixelsPerLine, "--samples")},
+          wanted_{options, description, lines_, samples_},
+          in_{options.in, description},
+          out_{options.out, wanted_} {}
+
+    void run(bool waitbar) {
+        Progress progress{Progress::Unit::kBytes, waitbar ? "Converting" : nullptr};
+        const std::int64_t in_all = wanted_.rasterSize();
+        for_each_tile(lines_.count(), samples_.count(), 1, [&](const Tile& tile) {
             throw_if_interrupted();
-            const int lines = std::min(per_block, lines_.count() - done);
-            copy_block(done, lines);
-            progress.step((done + lines) * bytes_per_line, lines_.count() * bytes_per_line);
-        }
+            copy(tile);
+            progress.step(
+                sample_offset(wanted_, tile.first_line + tile.lines - 1, tile.first_sample + tile.samples),
+                in_all);
+        });
+        throw_if_interrupted();
         out_.commit();
     }
 
 private:
-    void copy_block(int first, int lines) {
-        if (out_.file().RowPrefix > 0) copy_prefixes(first, lines);
-        const int type = out_.file().CellType;
-        if (type == in_.CellType && type >= INT8_COMPLEX) {
-            copy_bytes(first, lines);
-        } else if (type >= INT8_COMPLEX || in_.CellType >= INT8_COMPLEX) {
-            throw WrongUse("8-bit samples are copied as they are, not converted");
-        } else if (out_.file().is_complex() != 0 && in_.is_complex() == 0) {
-            copy_as_complex(first, lines);
-        } else if (out_.file().is_complex() != 0) {
-            copy_samples<dcomplex>(first, lines);
-        } else if (type == FLOAT32) {
-            copy_samples<float>(first, lines);
+    void copy(const Tile& tile) {
+        if (tile.first_sample == 0) {
+            for (int line = 0; line < tile.lines; ++line) copy_prefix(tile.first_line + line);
+        }
+        if (wanted_.CellType == FLOAT_COMPLEX) {
+            copy_samples(tile, singles_);
+        } else if (wanted_.is_complex() != 0) {
+            copy_samples(tile, doubles_);
+        } else if (wanted_.CellType == FLOAT32) {
+            copy_samples(tile, real_singles_);
         } else {
-            copy_samples<double>(first, lines);
+            copy_samples(tile, real_doubles_);
         }
     }
 
     template <typename T>
-    void copy_samples(int first, int lines) {
-        std::vector<T> block(static_cast<std::size_t>(lines) * static_cast<std::size_t>(samples_.count()));
-        in_.readbuffer(block.data(), lines_.first + first, lines, samples_.first, samples_.count());
-        out_.file().writebuffer(block.data(), first, lines, 0, 0);
+    void copy_samples(const Tile& tile, std::vector<T>& room) {
+        room.resize(tile.size());
+        Tile from = tile;
+        from.first_line += lines_.first;
+        from.first_sample += samples_.first;
+        in_.read(from, room.data());
+        out_.write(tile, room.data());
     }
 
-    void copy_as_complex(int first, int lines) {
-        std::vector<double> real(static_cast<std::size_t>(lines) * static_cast<std::size_t>(samples_.count()));
-        in_.readbuffer(real.data(), lines_.first + first, lines, samples_.first, samples_.count());
-        const std::vector<dcomplex> block(real.begin(), real.end());
-        out_.file().writebuffer(block.data(), first, lines, 0, 0);
-    }
-
-    // 8-bit samples have no byte order: their bytes are moved line by line.
-    void copy_bytes(int first, int lines) {
-        BufferFile& out = out_.file();
-        std::vector<char> line(static_cast<std::size_t>(samples_.count()) *
-                               static_cast<std::size_t>(out.element_sizeof()));
-        const auto move = [](BufferFile& file, std::int64_t to) {
-            file.seek(to - file.tell(), BufferFile::FROM_CURRENT);
-        };
-        const auto offset = [](const BufferFile& file, std::int64_t l, std::int64_t s) {
-            return file.HeaderOffset +
-                   l * (std::int64_t{file.NrOfPixelsPerLine} * file.element_sizeof() + file.RowPrefix) +
-                   file.RowPrefix + s * file.element_sizeof();
-        };
-        for (int i = 0; i < lines; ++i) {
-            move(in_, offset(in_, lines_.first + first + i, samples_.first));
-            in_.read(line.data(), static_cast<int>(line.size()));
-            move(out, offset(out, first + i, 0));
-            out.write(line.data(), static_cast<int>(line.size()));
+    void copy_prefix(int line) {
+        const std::int64_t bytes = wanted_.RowPrefix;
+        const std::int64_t from = sample_offset(in_.description(), lines_.first + line, 0) - bytes;
+        const std::int64_t to = sample_offset(wanted_, line, 0) - bytes;
+        for (std::int64_t done = 0; done < bytes; done += kPiece) {
+            const std::int64_t piece = std::min(kPiece, bytes - done);
+            prefix_.resize(static_cast<std::size_t>(piece));
+            in_.read_bytes(from + done, prefix_.data(), piece);
+            out_.write_bytes(to + done, prefix_.data(), piece);
         }
     }
 
-    void copy_prefixes(int first, int lines) {
-        std::vector<char> prefixes(static_cast<std::size_t>(lines) * static_cast<std::size_t>(in_.RowPrefix));
-        in_.readprefix(prefixes.data(), lines_.first + first, lines);
-        out_.file().writeprefix(prefixes.data(), first, lines);
-    }
+    static constexpr std::int64_t kPiece = 1 << 20;
 
-    std::string name_;
-    BufferFile in_;
     Cut lines_, samples_;
+    Wanted wanted_;
+    RasterReader in_;
     NewRaster out_;
+    // One of them holds the samples of a tile.
+    std::vector<float> real_singles_;
+    std::vector<double> real_doubles_;
+    std::vector<fcomplex> singles_;
+    std::vector<dcomplex> doubles_;
+    std::vector<char> prefix_;
 };
 
 int convert(const ConvertOptions& options) {
     DataFile description;
     read_description(options.in, description);
     note_interrupts();
-    Conversion{options, description}.run();
+    Conversion{options, description}.run(options.waitbar);
     return kFine;
 }
 
@@ -141,6 +132,7 @@ void add_convert(CLI::App& app, Job& job) {
     command->add_option("--samples", options->samples, "Samples A:B of each line");
     command->add_option("--prefix", options->prefix, "Line prefixes: keep (default) or drop")
         ->check(CLI::IsMember({"keep", "drop"}));
+    add_waitbar_option(*command, options->waitbar);
     command->callback([options, &job] { job = [options] { return convert(*options); }; });
 }
 

@@ -1,12 +1,17 @@
-#include <filesystem>
+#include <cmath>
+#include <cstdint>
 #include <memory>
 #include <nlohmann/json.hpp>
+#include <optional>
+#include <string>
 #include <vector>
 
 #include "commands.h"
+#include "document.h"
 #include "failure.h"
+#include "number.h"
 #include "output.h"
-#include "quo_base/quorelxml_v2.h"
+#include "product.h"
 
 namespace tool {
 namespace {
@@ -17,72 +22,35 @@ struct FieldOptions {
     bool json = false, create = false;
 };
 
-constexpr int kChannel = 1;
-constexpr std::size_t kTextRoom = 1024;
+void require_field(const std::string& field) {
+    if (field.find('/') == std::string::npos) throw WrongUse("FIELD " + field + ": give it as Section/Field");
+}
 
-/** One field of a header file, as texts. */
-class HeaderField : private quorelxml {
-public:
-    /** Throws Failure where the file is no header: a fresh document must not take its place. */
-    HeaderField(const std::string& header, std::string field) : header_{header}, field_{std::move(field)} {
-        std::error_code error;
-        if (!std::filesystem::exists(header, error)) throw Failure(header + ": no such file");
-        storeFileName(header.c_str());
-        if (parse() != QUO_OK || !isRecognized()) throw Failure(header + ": is no header file");
-        is_array_ = countNodes(kChannel, entries().c_str()) > 0;
-    }
+// A field that no object registers may be anything.
+bool is_number(const std::string& field) {
+    GeneralSAR product;
+    return is_numeric_field(product, field);
+}
 
-    [[nodiscard]] bool exists() const { return fieldExists(kChannel, field_.c_str()); }
-    /** Whether the values stand in `val` children, or in several elements of the field's name. */
-    [[nodiscard]] bool is_list() const { return is_array_ || countNodes(kChannel, field_.c_str()) > 1; }
-
-    std::vector<std::string> read() {
-        if (!exists()) throw Failure(header_ + ": has no field " + field_);
-        const std::string path = is_array_ ? entries() : field_;
-        const auto count = static_cast<std::size_t>(countNodes(kChannel, path.c_str()));
-        std::vector<std::vector<char>> rooms(count, std::vector<char>(kTextRoom));
-        std::vector<char*> texts;
-        for (auto& room : rooms) texts.push_back(room.data());
-        if (readString(kChannel, path.c_str(), texts.data(), static_cast<int>(count), kTextRoom) != QUO_OK) {
-            throw Failure(header_ + ": cannot read " + field_);
-        }
-        return {texts.begin(), texts.end()};
-    }
-
-    /** Replaces the field in its own form; a single value becomes several only in the form of numeric arrays. */
-    void write_values(const std::vector<std::string>& values) {
-        const bool array = is_array_ || (values.size() > 1 && !is_list());
-        const std::string path = array ? entries() : field_;
-        const auto count = static_cast<int>(values.size());
-        if (countNodes(kChannel, path.c_str()) > count) clearField(kChannel, path.c_str());
-        if (array && !is_array_ && exists()) clear_text();
-        std::vector<const char*> texts;
-        for (const std::string& value : values) texts.push_back(value.c_str());
-        if (writeString(kChannel, path.c_str(), texts.data(), count) != QUO_OK || write() != QUO_OK) {
-            throw Failure(header_ + ": cannot be written");
-        }
-    }
-
-private:
-    [[nodiscard]] std::string entries() const { return field_ + "/val"; }
-    void clear_text() {
-        const char* empty = "";
-        writeString(kChannel, field_.c_str(), &empty, 1);
-    }
-
-    std::string header_, field_;
-    bool is_array_ = false;
-};
+nlohmann::json as_json(const std::string& text, bool numeric) {
+    const auto number = numeric ? finite_number(text) : std::nullopt;
+    if (!number) return text;
+    const bool whole = text.find_first_of(".eE") == std::string::npos && std::abs(*number) < 1e15;
+    return whole ? nlohmann::json(static_cast<std::int64_t>(*number)) : nlohmann::json(*number);
+}
 
 int get_field(const FieldOptions& options) {
-    HeaderField field{options.header, options.field};
-    const std::vector<std::string> values = field.read();
+    require_field(options.field);
+    Document document{options.header};
+    const std::vector<std::string> values = document.values(options.field);
     Output output{"-"};
     if (options.json) {
-        const nlohmann::json value = field.is_list() ? nlohmann::json(values) : nlohmann::json(values.at(0));
-        output.write(nlohmann::json{{"field", options.field}, {"value", value}}.dump(
-                         2, ' ', false, nlohmann::json::error_handler_t::replace) +
-                     "\n");
+        const bool numeric = is_number(options.field);
+        nlohmann::json list = nlohmann::json::array();
+        for (const std::string& value : values) list.push_back(as_json(value, numeric));
+        const bool single = values.size() == 1 && !document.is_array(options.field);
+        const nlohmann::json about{{"field", options.field}, {"value", single ? list[0] : list}};
+        output.write(about.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n");
     } else {
         for (const std::string& value : values) output.write(value + "\n");
     }
@@ -90,15 +58,28 @@ int get_field(const FieldOptions& options) {
     return kFine;
 }
 
+// "nan" is a number that a header may hold; a word would read back as 0.
+bool can_be_number(const std::string& text) {
+    const bool not_finite = text == "nan" || text == "inf" || text == "-nan" || text == "-inf";
+    return not_finite || finite_number(text).has_value();
+}
+
 int set_field(const FieldOptions& options) {
+    require_field(options.field);
+    const bool numeric = is_number(options.field);
     for (const std::string& value : options.values) {
-        if (value.size() >= kTextRoom) throw WrongUse("a value of " + std::to_string(value.size()) + " bytes");
+        if (value.size() >= Document::kTextRoom) {
+            throw WrongUse("a value of " + std::to_string(value.size()) + " bytes");
+        }
+        if (numeric && !can_be_number(value))
+            throw WrongUse(options.field + " is a number, " + value + " is none");
     }
-    HeaderField field{options.header, options.field};
-    if (!field.exists() && !options.create) {
+    Document document{options.header};
+    if (!document.has(options.field) && !options.create) {
         throw Failure(options.header + ": has no field " + options.field + " (--create makes it)");
     }
-    field.write_values(options.values);
+    document.replace(options.field, options.values);
+    document.save();
     return kFine;
 }
 

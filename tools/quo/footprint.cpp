@@ -78,7 +78,7 @@ int footprint(const std::string& header) {
     read_product(header, product);
     const Ring ring = corners_of(product);
     if (ring.empty())
-        throw Failure(header + ": neither a corner grid nor orbit and region to find the corners from");
+        throw Failure(header + ": neither a corner grid nor orbit, region and look side to find the corners from");
     const nlohmann::ordered_json feature{
         {"type", "Feature"},
         {"properties", {{"header", header}, {"scene", product.dataSetInfo.SceneID}}},

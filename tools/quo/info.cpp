@@ -14,23 +14,26 @@
 namespace tool {
 namespace {
 
-/** What is known of a product, in the order in which it is shown. */
+/** What is known of a product, in the order in which it is shown: to people with rounded numbers and handy units,
+ * as JSON exactly. */
 class Facts {
 public:
-    void add(const char* name, const std::string& text, nlohmann::ordered_json value) {
-        rows_.push_back({name, text});
-        json_[name] = std::move(value);
+    void add(const char* name, const char* key, const std::string& text, nlohmann::ordered_json value) {
+        rows_.push_back({name, one_line(text)});
+        json_[key] = std::move(value);
     }
-    void add(const char* name, const std::string& text) { add(name, text, text); }
-    void add_number(const char* name, double value, const char* unit) {
-        if (value > -900.0) add(name, exact(value) + " " + unit, value);
+    void add_text(const char* name, const char* key, const std::string& text) { add(name, key, text, text); }
+    /** A text that is not the mark of a missing one. */
+    void add_known(const char* name, const char* key, std::string_view text, std::string_view unknown) {
+        if (!text.empty() && text != unknown && text != "NOT_AVAILABLE") add_text(name, key, std::string{text});
     }
-    void add_known(const char* name, std::string_view text, std::string_view unknown) {
-        if (!text.empty() && text != unknown && text != "NOT_AVAILABLE") add(name, std::string{text});
+    /** A number that is not the mark of a missing one; people see `scale` times it in `unit`. */
+    void add_number(const char* name, const char* key, double value, double scale, const char* unit) {
+        if (value > kUnknown) add(name, key, handy(value * scale) + " " + unit, value);
     }
-    void add_time(const char* name, double seconds) {
+    void add_time(const char* name, const char* key, double seconds) {
         const std::string date = date_text(seconds).value_or("-");
-        add(name, date + "  (" + exact(seconds) + " s)", {{"seconds", seconds}, {"date", date}});
+        add(name, key, date + "  (" + exact(seconds) + " s)", {{"seconds", seconds}, {"date", date}});
     }
 
     [[nodiscard]] std::string text() const {
@@ -47,6 +50,8 @@ public:
     }
 
 private:
+    static constexpr double kUnknown = -900.0;
+
     struct Row {
         std::string name, value;
     };
@@ -55,39 +60,38 @@ private:
 };
 
 void add_data_set(Facts& facts, const DataSetInfo_Obj& info) {
-    facts.add_known("mission", info.SensorName, "SENSOR UNKNOWN");
-    facts.add_known("mode", info.AcquisitionMode, "ACQUISITION MODE UNDEFINED");
-    facts.add_known("polarization", info.Polarization, "");
-    facts.add_known("swath", info.Swath, "");
-    facts.add_known("scene", info.SceneID, "");
-    facts.add_known("description", info.Description, "");
-    facts.add_known("image type", info.ImageType, "NOT SET");
-    facts.add_known("projection", info.Projection, "PROJECTION UNDEFINED");
-    facts.add("look side", info.LookDirection < 0 ? "left" : "right");
+    facts.add_known("mission", "mission", info.SensorName, "SENSOR UNKNOWN");
+    facts.add_known("mode", "mode", info.AcquisitionMode, "ACQUISITION MODE UNDEFINED");
+    facts.add_known("polarization", "polarization", info.Polarization, "");
+    facts.add_known("swath", "swath", info.Swath, "");
+    facts.add_known("scene", "scene", info.SceneID, "");
+    facts.add_known("description", "description", info.Description, "");
+    facts.add_known("image type", "image_type", info.ImageType, "NOT SET");
+    facts.add_known("projection", "projection", info.Projection, "PROJECTION UNDEFINED");
+    facts.add_text("look side", "look_side", info.LookDirection < 0 ? "left" : "right");
 }
 
-void add_times(Facts& facts, const GeneralSAR& product) {
-    const ROI_Obj& region = product.roi.Roi;
-    if (product.GSexists(gsRoi) && region.isNULL() == 0) {
-        facts.add_time("first line", region.SlowStartTime);
-        facts.add_time("last line", region.SlowStartTime + region.SlowTimeLength);
-        facts.add_number("span", region.SlowTimeLength, "s");
-        facts.add("region",
-                  std::to_string(region.Lines) + " lines x " + std::to_string(region.Samples) + " samples",
-                  {{"lines", region.Lines}, {"samples", region.Samples}});
-    }
-    if (!product.GSexists(gsOrbit)) return;
-    const GeneralSAROrbit& orbit = product.orbit;
+void add_region(Facts& facts, const ROI_Obj& region) {
+    if (region.isNULL() != 0) return;
+    facts.add_time("first line", "first_line", region.SlowStartTime);
+    facts.add_time("last line", "last_line", region.SlowStartTime + region.SlowTimeDelta * (region.Lines - 1));
+    facts.add_number("span", "span_s", region.SlowTimeLength, 1.0, "s");
+    facts.add("region", "region",
+              std::to_string(region.Lines) + " lines x " + std::to_string(region.Samples) + " samples",
+              {{"lines", region.Lines}, {"samples", region.Samples}});
+}
+
+void add_orbit(Facts& facts, const GeneralSAROrbit& orbit) {
     const double last = orbit.t0SV_s + orbit.dtSV_s * (orbit.nSV_n - 1);
-    facts.add("orbit direction", orbit.isAscending() ? "ascending" : "descending");
-    facts.add(
-        "state vectors",
-        std::to_string(orbit.nSV_n) + ", " + exact(orbit.dtSV_s) + " s apart, to " + date_text(last).value_or("-"),
-        {{"count", orbit.nSV_n}, {"spacing_s", orbit.dtSV_s}, {"first_s", orbit.t0SV_s}, {"last_s", last}});
+    facts.add_text("orbit direction", "orbit_direction", orbit.isAscending() ? "ascending" : "descending");
+    facts.add("state vectors", "state_vectors",
+              std::to_string(orbit.nSV_n) + ", " + exact(orbit.dtSV_s) + " s apart, from " +
+                  date_text(orbit.t0SV_s).value_or("-") + " to " + date_text(last).value_or("-"),
+              {{"count", orbit.nSV_n}, {"spacing_s", orbit.dtSV_s}, {"first_s", orbit.t0SV_s}, {"last_s", last}});
 }
 
 void add_raster(Facts& facts, const RasterDescription& raster) {
-    facts.add("raster",
+    facts.add("raster", "raster",
               std::to_string(raster.NrOfLinesPerImage) + " lines x " + std::to_string(raster.NrOfPixelsPerLine) +
                   " samples, " + type_name(raster.CellType) + ", " +
                   (raster.ByteOrder == 1 ? "big-endian" : "little-endian"),
@@ -100,12 +104,12 @@ void add_raster(Facts& facts, const RasterDescription& raster) {
 }
 
 void add_sampling(Facts& facts, const SamplingConstants_Obj& sampling) {
-    facts.add_number("PRF", sampling.prf_hz, "Hz");
-    facts.add_number("sampling rate", sampling.frg_hz, "Hz");
-    facts.add_number("carrier", sampling.fc_hz, "Hz");
-    facts.add_number("wavelength", sampling.lambda_m, "m");
-    facts.add_number("range bandwidth", sampling.Brg_hz, "Hz");
-    facts.add_number("azimuth bandwidth", sampling.Baz_hz, "Hz");
+    facts.add_number("PRF", "prf_hz", sampling.prf_hz, 1.0, "Hz");
+    facts.add_number("sampling rate", "sampling_rate_hz", sampling.frg_hz, 1e-6, "MHz");
+    facts.add_number("carrier", "carrier_hz", sampling.fc_hz, 1e-9, "GHz");
+    facts.add_number("wavelength", "wavelength_m", sampling.lambda_m, 1.0, "m");
+    facts.add_number("range bandwidth", "range_bandwidth_hz", sampling.Brg_hz, 1e-6, "MHz");
+    facts.add_number("azimuth bandwidth", "azimuth_bandwidth_hz", sampling.Baz_hz, 1.0, "Hz");
 }
 
 void add_corners(Facts& facts, GeneralSAR& product) {
@@ -115,7 +119,7 @@ void add_corners(Facts& facts, GeneralSAR& product) {
         list.push_back({{"latitude_deg", corner.latitude_deg}, {"longitude_deg", corner.longitude_deg}});
         text += (text.empty() ? "" : "; ") + fixed(corner.latitude_deg, 5) + " " + fixed(corner.longitude_deg, 5);
     }
-    if (!text.empty()) facts.add("corners", text, list);
+    if (!text.empty()) facts.add("corners", "corners", text + "  (latitude longitude, degrees)", list);
 }
 
 void add_objects(Facts& facts, const GeneralSAR& product) {
@@ -123,24 +127,28 @@ void add_objects(Facts& facts, const GeneralSAR& product) {
                                       "StateVectors", "Orbit",          "Pulse",           "AntennaPattern",
                                       "DataSetInfo",  "SensorAttitude", "SpectralWindows", "geoCoords",
                                       "SwathInfo",    "BufferFile"};
-    nlohmann::ordered_json list = nlohmann::json::array();
-    std::string text;
-    for (int i = 0; i < GeneralSAR::kObjects; ++i) {
-        if (!product.GSexists(static_cast<GSObject>(i))) continue;
-        list.push_back(kNames[i]);
-        text += (text.empty() ? "" : " ") + std::string{kNames[i]};
+    for (const bool present : {true, false}) {
+        nlohmann::ordered_json list = nlohmann::json::array();
+        std::string text;
+        for (int i = 0; i < GeneralSAR::kObjects; ++i) {
+            if (product.GSexists(static_cast<GSObject>(i)) != present) continue;
+            list.push_back(kNames[i]);
+            text += (text.empty() ? "" : " ") + std::string{kNames[i]};
+        }
+        const char* name = present ? "objects" : "absent";
+        facts.add(name, name, text.empty() ? "none" : text, list);
     }
-    facts.add("objects", text, list);
 }
 
 int show_info(const std::string& header, bool json) {
     GeneralSAR product;
     read_product(header, product);
     Facts facts;
-    facts.add("header", header);
+    facts.add_text("header", "header", header);
     if (product.GSexists(gsDataSetInfo)) add_data_set(facts, product.dataSetInfo);
-    add_times(facts, product);
-    if (product.GSexists(gsBufferFile)) add_raster(facts, product.bufferFile);
+    if (product.GSexists(gsRoi)) add_region(facts, product.roi.Roi);
+    if (product.GSexists(gsOrbit)) add_orbit(facts, product.orbit);
+    if (const RasterDescription* raster = described_raster(product)) add_raster(facts, *raster);
     if (product.GSexists(gsSamplingConstants)) add_sampling(facts, product.samplingConstants);
     add_corners(facts, product);
     add_objects(facts, product);

@@ -11,11 +11,16 @@ namespace tool {
 void append_exact(std::string& text, double value);
 std::string exact(double value);
 
+/** The double whose shortest text is that of the float: 0.8 and not 0.800000011920929. */
+double as_written(float value);
+
 /** The value with a fixed number of decimals. */
 std::string fixed(double value, int decimals);
 
 /** The value with three significant digits, for people. */
 std::string rough(double value);
+/** The value with ten significant digits, for people who compare. */
+std::string handy(double value);
 
 /** The number that the whole text is, blanks around it and a leading plus sign allowed. Nothing for anything else,
  * and for infinity and not-a-number, which no computation here can use. */

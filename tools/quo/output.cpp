@@ -16,11 +16,6 @@ namespace {
 
 constexpr std::size_t kBlock = 1 << 16;
 
-std::string resolved(const std::string& name) {
-    char path[PATH_MAX];
-    return realpath(name.c_str(), path) != nullptr ? path : name;
-}
-
 mode_t permissions_of_new_files() {
     const mode_t mask = umask(0);
     umask(mask);
@@ -28,6 +23,13 @@ mode_t permissions_of_new_files() {
 }
 
 }  // namespace
+
+std::string resolved(const std::string& name) {
+    struct stat about {};
+    if (lstat(name.c_str(), &about) != 0 || !S_ISLNK(about.st_mode)) return name;
+    char path[PATH_MAX];
+    return realpath(name.c_str(), path) != nullptr ? path : name;
+}
 
 Output::Output(const std::string& name) : name_{name == "-" ? "standard output" : name} {
     struct stat about {};

@@ -6,6 +6,10 @@
 
 namespace tool {
 
+/** The file that a symbolic link leads to, so that the link keeps pointing at a file that is replaced; any other
+ * name as it stands. */
+std::string resolved(const std::string& name);
+
 /** Where a result goes: standard output for "-", else a file that appears under its name in one step.
  *
  * A file is written beside its final name and renamed by commit(); whatever happens before, an older file of that

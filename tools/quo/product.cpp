@@ -1,6 +1,7 @@
 #include "product.h"
 
 #include <array>
+#include <cmath>
 #include <filesystem>
 
 #include "failure.h"
@@ -23,27 +24,8 @@ constexpr std::array<const char*, GeneralSAR::kObjects> kSections{"raster side f
                                                                   "SwathInfo",
                                                                   "RasterInfo"};
 
-bool is_known(const geopoint& point) { return point.Latitude > -900.0 && point.Longitude > -900.0; }
-
-std::vector<Corner> grid_corners(const geoCoords_Obj& grid) {
-    std::vector<Corner> corners;
-    for (const geopoint* point : {&grid.NorthWest, &grid.NorthEast, &grid.SouthEast, &grid.SouthWest}) {
-        if (!is_known(*point)) return {};
-        corners.push_back({point->Latitude, point->Longitude});
-    }
-    return corners;
-}
-
-std::vector<Corner> orbit_corners(GeneralSAROrbit& orbit, const ROI_Obj& region) {
-    std::vector<Corner> corners;
-    for (const ROI_Time& at :
-         {region.GetUpLeft(), region.GetUpRight(), region.GetDownRight(), region.GetDownLeft()}) {
-        Corner corner{};
-        if (orbit.SVGetLatLon(at.SlowTime, at.FastTime, &corner.latitude_deg, &corner.longitude_deg) != 0)
-            return {};
-        corners.push_back(corner);
-    }
-    return corners;
+bool is_known(const geopoint& point) {
+    return std::abs(point.Latitude) <= 90.0 && std::abs(point.Longitude) <= 360.0;
 }
 
 }  // namespace
@@ -57,18 +39,79 @@ void read_product(const std::string& header, GeneralSAR& product) {
     for (int object = gsRoi; object < GeneralSAR::kObjects; ++object) {
         if (product.GSexists(static_cast<GSObject>(object))) return;
     }
+    if (described_raster(product) != nullptr) return;
     throw Failure(header + ": holds no object of a product");
 }
 
 const char* section_of(GSObject object) { return kSections[static_cast<std::size_t>(object)]; }
 
-std::vector<Corner> corners_of(GeneralSAR& product) {
+const GeneralSAR_Base& elements_of(GeneralSAR& product, GSObject object) {
+    return object == gsRoi ? product.roi.Roi : *product.GSget(object);
+}
+
+const parElement* element_at(GeneralSAR& product, std::string_view field) {
+    const auto slash = field.find('/');
+    if (slash == std::string_view::npos) return nullptr;
+    for (int i = gsRoi; i < GeneralSAR::kObjects; ++i) {
+        const auto object = static_cast<GSObject>(i);
+        if (field.substr(0, slash) != section_of(object)) continue;
+        const GeneralSAR_Base& elements = elements_of(product, object);
+        for (int k = 0; k < elements.elementCount(); ++k) {
+            if (field.substr(slash + 1) == elements.element(k)->name) return elements.element(k);
+        }
+    }
+    return nullptr;
+}
+
+bool is_numeric_field(GeneralSAR& product, std::string_view field) {
+    // Polynomials and corner points stand in sections of their own, as many as there are.
+    for (const char* nested : {"/pol", "/trg0_s", "/taz0_s", "/Point"}) {
+        if (field.ends_with(nested)) return true;
+    }
+    const parElement* element = element_at(product, field);
+    return element != nullptr && element->type != parElement::typeString;
+}
+
+std::vector<Corner> grid_corners(const GeneralSAR& product) {
+    if (!product.GSexists(gsGeoCoords)) return {};
+    const geoCoords_Obj& grid = product.geoCoords;
     std::vector<Corner> corners;
-    if (product.GSexists(gsGeoCoords)) corners = grid_corners(product.geoCoords);
-    if (corners.empty() && product.GSexists(gsOrbit) && product.GSexists(gsRoi) && product.roi.Roi.isNULL() == 0) {
-        corners = orbit_corners(product.orbit, product.roi.Roi);
+    for (const geopoint* point : {&grid.NorthWest, &grid.NorthEast, &grid.SouthEast, &grid.SouthWest}) {
+        if (!is_known(*point)) return {};
+        corners.push_back({point->Latitude, point->Longitude});
     }
     return corners;
+}
+
+std::vector<Corner> orbit_corners(GeneralSAR& product) {
+    const ROI_Obj& region = product.roi.Roi;
+    for (const GSObject needed : {gsOrbit, gsRoi, gsDataSetInfo}) {  // the last tells the look side
+        if (!product.GSexists(needed)) return {};
+    }
+    if (region.isNULL() != 0) return {};
+    std::vector<Corner> corners;
+    for (const ROI_Time& at :
+         {region.GetUpLeft(), region.GetUpRight(), region.GetDownRight(), region.GetDownLeft()}) {
+        Corner corner{};
+        if (product.orbit.SVGetLatLon(at.SlowTime, at.FastTime, &corner.latitude_deg, &corner.longitude_deg) !=
+            0) {
+            return {};
+        }
+        corners.push_back(corner);
+    }
+    return corners;
+}
+
+std::vector<Corner> corners_of(GeneralSAR& product) {
+    std::vector<Corner> corners = grid_corners(product);
+    return corners.empty() ? orbit_corners(product) : corners;
+}
+
+const RasterDescription* described_raster(const GeneralSAR& product) {
+    if (product.GSexists(gsBufferFile)) return &product.bufferFile;
+    // A side file in its older form, which only this object reads; it is there in any case.
+    const DataFile& older = product.dataFile.File;
+    return older.NrOfLinesPerImage != 0 && older.NrOfPixelsPerLine != 0 ? &older : nullptr;
 }
 
 std::optional<std::string> raster_of(const std::string& header) {

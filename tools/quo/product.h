@@ -3,6 +3,7 @@
 
 #include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "quo_base/generalSAR.h"
@@ -15,13 +16,26 @@ void read_product(const std::string& header, GeneralSAR& product);
 /** The sections that a product's objects stand in, in the order of GSObject. */
 const char* section_of(GSObject object);
 
+/** What object `object` registers in its section; for the region, what the region itself does. */
+const GeneralSAR_Base& elements_of(GeneralSAR& product, GSObject object);
+/** The same, or null, for the element at a path such as "SamplingConstants/prf_hz". */
+const parElement* element_at(GeneralSAR& product, std::string_view field);
+/** Whether a field is known to hold numbers. */
+bool is_numeric_field(GeneralSAR& product, std::string_view field);
+
 struct Corner {
     double latitude_deg, longitude_deg;
 };
-/** The corners of a product around its edge, from the corner grid, else from orbit and region. Empty where neither
- * is there. */
+/** The corners of a product around its edge, from the corner grid, else as orbit_corners() finds them. Empty where
+ * neither can be had. */
 std::vector<Corner> corners_of(GeneralSAR& product);
+/** The same from orbit, region and look side alone. */
+std::vector<Corner> orbit_corners(GeneralSAR& product);
+/** The same from the corner grid alone. */
+std::vector<Corner> grid_corners(const GeneralSAR& product);
 
+/** The description of the raster that the header belongs to, in whichever form; null where there is none. */
+const RasterDescription* described_raster(const GeneralSAR& product);
 /** The name of the raster that a header belongs to: the header's name without ".hdr"; nothing for another name. */
 std::optional<std::string> raster_of(const std::string& header);
 

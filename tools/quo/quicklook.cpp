@@ -19,6 +19,7 @@ namespace {
 struct QuicklookOptions {
     std::string raster, picture, looks, db = "auto";
     int width = 1000;
+    bool waitbar = false;
 };
 
 struct Looks {
@@ -48,37 +49,35 @@ Looks looks_of(const QuicklookOptions& options, const DataFile& raster) {
     return {static_cast<int>(*azimuth), static_cast<int>(*range)};
 }
 
-/** The mean power of looks x looks samples each, over the whole raster, read line block by line block. */
+/** The mean power of looks x looks samples each, over the whole raster, read tile by tile. Looks at the far ends
+ * that are not full are left out. */
 class Multilook {
 public:
-    Multilook(const DataFile& raster, const std::string& name, Looks looks) : looks_{looks}, file_{name.c_str()} {
-        file_.copyDescription(raster);
-        looks_.azimuth = std::min(looks.azimuth, raster.NrOfLinesPerImage);
-        looks_.range = std::min(looks.range, raster.NrOfPixelsPerLine);
-        // Looks at the far ends that are not full are left out.
-        width_ = static_cast<std::size_t>(raster.NrOfPixelsPerLine / looks_.range);
-        height_ = static_cast<std::size_t>(raster.NrOfLinesPerImage / looks_.azimuth);
-        if (file_.CellType >= INT8_COMPLEX) throw Failure(name + ": 8-bit samples are not supported");
-        file_.open(BufferFile::READ);
-        if (!file_.is_open()) throw Failure(name + ": cannot be opened");
+    Multilook(const RasterDescription& raster, const std::string& name, Looks looks)
+        : looks_{std::min(looks.azimuth, raster.NrOfLinesPerImage),
+                 std::min(looks.range, raster.NrOfPixelsPerLine)},
+          width_{static_cast<std::size_t>(raster.NrOfPixelsPerLine / looks_.range)},
+          height_{static_cast<std::size_t>(raster.NrOfLinesPerImage / looks_.azimuth)},
+          file_{name, raster} {
+        if (width_ * height_ > kMostPixels) {
+            throw Failure(name + ": a picture of " + std::to_string(width_) + " x " + std::to_string(height_) +
+                          " pixels is too large; take more looks");
+        }
         power_.assign(width_ * height_, 0.0F);
     }
 
-    void run() {
+    void run(bool waitbar) {
         const int lines = static_cast<int>(height_) * looks_.azimuth;
-        const int per_block = block_lines(std::int64_t{file_.NrOfPixelsPerLine} * 8, lines);
-        const std::int64_t bytes_per_line = std::int64_t{file_.NrOfPixelsPerLine} * file_.element_sizeof();
-        Progress progress{Progress::Unit::kBytes};
-        for (int first = 0; first < lines; first += per_block) {
+        const int samples = static_cast<int>(width_) * looks_.range;
+        Progress progress{Progress::Unit::kBytes, waitbar ? "Quick look" : nullptr};
+        const std::int64_t bytes = file_.description().element_sizeof();
+        for_each_tile(lines, samples, looks_.range, [&](const Tile& tile) {
             throw_if_interrupted();
-            const int count = std::min(per_block, lines - first);
-            if (file_.is_complex() != 0) {
-                add_block<fcomplex>(first, count);
-            } else {
-                add_block<float>(first, count);
-            }
-            progress.step((first + count) * bytes_per_line, lines * bytes_per_line);
-        }
+            file_.description().is_complex() != 0 ? add(tile, complex_) : add(tile, real_);
+            const std::int64_t done =
+                std::int64_t{tile.first_line + tile.lines - 1} * samples + tile.first_sample + tile.samples;
+            progress.step(done * bytes, std::int64_t{lines} * samples * bytes);
+        });
         const float scale = 1.0F / (static_cast<float>(looks_.azimuth) * static_cast<float>(looks_.range));
         for (float& value : power_) value *= scale;
     }
@@ -89,15 +88,17 @@ public:
     [[nodiscard]] const std::vector<float>& power() const { return power_; }
 
 private:
+    static constexpr std::size_t kMostPixels = std::size_t{1} << 26;
+
     template <typename T>
-    void add_block(int first, int lines) {
-        const auto samples = static_cast<std::size_t>(file_.NrOfPixelsPerLine);
-        std::vector<T> block(samples * static_cast<std::size_t>(lines));
-        file_.readbuffer(block.data(), first, lines, 0, 0);
-        for (int line = 0; line < lines; ++line) {
-            const T* from = block.data() + static_cast<std::size_t>(line) * samples;
-            float* to = power_.data() + static_cast<std::size_t>((first + line) / looks_.azimuth) * width_;
-            for (std::size_t pixel = 0; pixel < width_; ++pixel) {
+    void add(const Tile& tile, std::vector<T>& room) {
+        room.resize(tile.size());
+        file_.read(tile, room.data());
+        const T* from = room.data();
+        const auto first = static_cast<std::size_t>(tile.first_sample / looks_.range);
+        for (int line = tile.first_line; line < tile.first_line + tile.lines; ++line) {
+            float* to = power_.data() + static_cast<std::size_t>(line / looks_.azimuth) * width_ + first;
+            for (int pixel = 0; pixel < tile.samples / looks_.range; ++pixel) {
                 for (int look = 0; look < looks_.range; ++look) {
                     const float value = std::norm(*from++);
                     to[pixel] += std::isfinite(value) ? value : 0.0F;
@@ -107,19 +108,26 @@ private:
     }
 
     Looks looks_;
-    BufferFile file_;
-    std::size_t width_ = 0, height_ = 0;
+    std::size_t width_, height_;
+    RasterReader file_;
     std::vector<float> power_;
+    std::vector<float> real_;  // the samples of a tile, as the raster has them
+    std::vector<fcomplex> complex_;
 };
 
 double decibel(float power) {
     return power > 0.0F ? 10.0 * std::log10(static_cast<double>(power)) : -std::numeric_limits<double>::infinity();
 }
 
-// From the 2nd to the 98th percentile of what is not empty, and never less than 3 dB.
+// From the 2nd to the 98th percentile of what is not empty, and never less than 3 dB. A part of the pixels, evenly
+// taken, tells the percentiles of a large picture.
 Stretch automatic_stretch(const std::vector<float>& power) {
+    constexpr std::size_t kEnough = 1 << 20;
+    const std::size_t step = 1 + power.size() / kEnough;
     std::vector<float> filled;
-    std::ranges::copy_if(power, std::back_inserter(filled), [](float value) { return value > 0.0F; });
+    for (std::size_t i = 0; i < power.size(); i += step) {
+        if (power[i] > 0.0F) filled.push_back(power[i]);
+    }
     if (filled.empty()) return {0.0, 1.0};
     const auto percentile = [&](double share) {
         const auto index = static_cast<std::ptrdiff_t>(share * static_cast<double>(filled.size() - 1));
@@ -149,7 +157,7 @@ int quicklook(const QuicklookOptions& options) {
     if (raster.NrOfLinesPerImage < 1 || raster.NrOfPixelsPerLine < 1) throw Failure(options.raster + ": is empty");
     note_interrupts();
     Multilook multilook{raster, options.raster, looks_of(options, raster)};
-    multilook.run();
+    multilook.run(options.waitbar);
     const Stretch stretch = stretch_of(options, multilook.power());
     Picture picture{multilook.width(), multilook.height(), {}};
     picture.grey.reserve(multilook.power().size());
@@ -168,9 +176,12 @@ void add_quicklook(CLI::App& app, Job& job) {
     CLI::App* command = app.add_subcommand("quicklook", "Shows a raster as a picture: power in dB, multilooked");
     command->add_option("RASTER", options->raster, "Raster with a side file RASTER.hdr")->required();
     command->add_option("OUT", options->picture, "Picture to write (PNG)")->required();
-    command->add_option("--looks", options->looks, "Lines x samples averaged into a pixel, such as 4x1");
+    CLI::Option* looks =
+        command->add_option("--looks", options->looks, "Lines x samples averaged into a pixel, such as 4x1");
     command->add_option("--db", options->db, "Black and white: MIN:MAX in dB, or auto (2nd to 98th percentile)");
-    command->add_option("--width", options->width, "Greatest width in pixels where --looks is not given");
+    command->add_option("--width", options->width, "Greatest width in pixels, in place of --looks (1000)")
+        ->excludes(looks);
+    add_waitbar_option(*command, options->waitbar);
     command->callback([options, &job] { job = [options] { return quicklook(*options); }; });
 }
 

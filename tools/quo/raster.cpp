@@ -1,14 +1,21 @@
 #include "raster.h"
 
+#include <fcntl.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <array>
 #include <cctype>
 #include <charconv>
+#include <cmath>
+#include <complex>
 #include <filesystem>
+#include <optional>
+#include <type_traits>
 
 #include "failure.h"
+#include "interrupt.h"
+#include "output.h"
 
 namespace tool {
 namespace {
@@ -16,7 +23,10 @@ namespace {
 constexpr std::array<std::string_view, 10> kNames{"FLOAT_COMPLEX", "FLOAT32", "DOUBLE_COMPLEX", "FLOAT64",
                                                   "INT32_COMPLEX", "INT32",   "SHORT_COMPLEX",  "INT16",
                                                   "INT8_COMPLEX",  "INT8"};
-constexpr std::int64_t kBlockBytes = 8 << 20;
+constexpr std::size_t kLongestName = 511;  // of the library's raster files
+
+template <typename T>
+constexpr bool kIsComplex = std::is_same_v<T, fcomplex> || std::is_same_v<T, dcomplex>;
 
 std::optional<int> index_of(std::string_view text, int otherwise) {
     if (text.empty()) return otherwise;
@@ -25,12 +35,56 @@ std::optional<int> index_of(std::string_view text, int otherwise) {
     return error == std::errc{} && end == text.data() + text.size() ? std::optional{value} : std::nullopt;
 }
 
+// 8-bit samples, which the library's typed access leaves to its callers; they have no byte order.
+void widen(const signed char* from, std::size_t count, double* to) { std::copy_n(from, count, to); }
+void widen(const signed char* from, std::size_t count, float* to) { std::copy_n(from, count, to); }
+template <typename T>
+void widen(const signed char* from, std::size_t count, std::complex<T>* to) {
+    for (std::size_t i = 0; i < count; ++i) to[i] = {static_cast<T>(from[2 * i]), static_cast<T>(from[2 * i + 1])};
+}
+
+signed char narrowed(double value) {
+    return static_cast<signed char>(std::isnan(value) ? 0.0 : std::clamp(std::round(value), -128.0, 127.0));
+}
+void narrow(const double* from, std::size_t count, signed char* to) {
+    std::transform(from, from + count, to, narrowed);
+}
+void narrow(const dcomplex* from, std::size_t count, signed char* to) {
+    for (std::size_t i = 0; i < count; ++i) {
+        to[2 * i] = narrowed(from[i].real());
+        to[2 * i + 1] = narrowed(from[i].imag());
+    }
+}
+
+bool is_narrow(const RasterDescription& raster) { return raster.CellType >= INT8_COMPLEX; }
+
+std::filesystem::file_type kind_of(const std::string& name) {
+    std::error_code error;
+    return std::filesystem::status(name, error).type();
+}
+bool can_be_replaced(const std::string& name) {
+    const auto kind = kind_of(name);
+    return kind == std::filesystem::file_type::not_found || kind == std::filesystem::file_type::regular;
+}
+
+// What the system has taken but cannot store is found here.
+bool reaches_the_disk(const std::string& name) {
+    const int descriptor = open(name.c_str(), O_RDONLY | O_CLOEXEC);
+    if (descriptor < 0) return false;
+    const bool done = fsync(descriptor) == 0;
+    return close(descriptor) == 0 && done;
+}
+
 }  // namespace
 
 void read_description(const std::string& name, DataFile& raster) {
-    if (raster.read_hdr(name.c_str()) != QUO_OK) throw Failure(name + ".hdr: no complete description of a raster");
+    const std::string side_file = name + ".hdr";
+    if (kind_of(name) == std::filesystem::file_type::not_found) throw Failure(name + ": no such file");
+    if (kind_of(side_file) == std::filesystem::file_type::not_found) throw Failure(side_file + ": no such file");
+    if (raster.read_hdr(name.c_str()) != QUO_OK)
+        throw Failure(side_file + ": no complete description of a raster");
     const std::int64_t size = raster.rasterSize();
-    if (size < 0) throw Failure(name + ".hdr: describes no possible raster");
+    if (size < 0) throw Failure(side_file + ": describes no possible raster");
     std::error_code error;
     const auto length = std::filesystem::file_size(name, error);
     if (error) throw Failure(name + ": " + error.message());
@@ -53,7 +107,11 @@ int type_of(std::string_view name) {
             [](unsigned char c) { return static_cast<int>(c); });
     };
     const auto* found = std::ranges::find_if(kNames, same);
-    if (found == kNames.end()) throw WrongUse("no cell type " + std::string{name});
+    if (found == kNames.end()) {
+        std::string known;
+        for (const std::string_view one : kNames) known.append(known.empty() ? "" : ", ").append(one);
+        throw WrongUse("no cell type " + std::string{name} + "; there are " + known);
+    }
     return static_cast<int>(found - kNames.begin());
 }
 
@@ -67,49 +125,148 @@ Cut cut_of(std::string_view text, int length, const char* option) {
     return {*first, *last};
 }
 
-int block_lines(std::int64_t bytes_per_line, int lines) {
-    return static_cast<int>(
-        std::clamp<std::int64_t>(kBlockBytes / std::max<std::int64_t>(bytes_per_line, 1), 1, lines));
+std::int64_t sample_offset(const RasterDescription& raster, std::int64_t line, std::int64_t sample) {
+    const std::int64_t size = raster.element_sizeof();
+    return raster.HeaderOffset + line * (raster.NrOfPixelsPerLine * size + raster.RowPrefix) + raster.RowPrefix +
+           sample * size;
 }
 
-NewRaster::NewRaster(const std::string& name, const RasterDescription& like) : name_{name} {
-    if (name.size() + 40 > 511) throw Failure(name + ": name too long");
-    std::error_code error;
-    const auto kind = std::filesystem::status(name, error).type();
-    if (kind != std::filesystem::file_type::not_found && kind != std::filesystem::file_type::regular) {
-        throw Failure(name + ": is no regular file");
+RasterReader::RasterReader(std::string name, const RasterDescription& description)
+    : name_{std::move(name)}, file_{name_.c_str()} {
+    file_.copyDescription(description);
+    file_.open(BufferFile::READ);
+    if (!file_.is_open()) throw Failure(name_ + ": cannot be opened");
+}
+
+void RasterReader::fail() const {
+    throw_if_interrupted();
+    throw Failure(name_ + ": cannot be read");
+}
+
+void RasterReader::read_bytes(std::int64_t offset, char* to, std::int64_t bytes) {
+    file_.seek(offset - file_.tell(), BufferFile::FROM_CURRENT);  // from the start, a seek to 0 does nothing
+    if (file_.read(to, static_cast<int>(bytes)) != bytes) fail();
+}
+
+template <typename T>
+void RasterReader::read(const Tile& tile, T* to) {
+    if constexpr (!kIsComplex<T>) {
+        if (file_.is_complex() != 0) fail();
+    } else {
+        if (file_.is_complex() == 0) {
+            real_.resize(tile.size());
+            read(tile, real_.data());
+            std::copy(real_.begin(), real_.end(), to);
+            return;
+        }
     }
-    file_.copyDescription(like);
+    if (!is_narrow(file_)) {
+        file_.seek(1, BufferFile::FROM_START);  // a block that cannot be read leaves the place alone
+        file_.readbuffer(to, tile.first_line, tile.lines, tile.first_sample, tile.samples);
+        if (file_.tell() == 1) fail();
+        return;
+    }
+    const auto samples = static_cast<std::size_t>(tile.samples);
+    narrow_.resize(samples * static_cast<std::size_t>(file_.element_sizeof()));
+    for (int line = 0; line < tile.lines; ++line) {
+        read_bytes(sample_offset(file_, tile.first_line + line, tile.first_sample),
+                   reinterpret_cast<char*>(narrow_.data()), static_cast<std::int64_t>(narrow_.size()));
+        widen(narrow_.data(), samples, to + static_cast<std::size_t>(line) * samples);
+    }
 }
+template void RasterReader::read(const Tile&, float*);
+template void RasterReader::read(const Tile&, double*);
+template void RasterReader::read(const Tile&, fcomplex*);
+template void RasterReader::read(const Tile&, dcomplex*);
 
-void NewRaster::open() {
-    unfinished_ = name_ + ".unfinished." + std::to_string(getpid());
-    file_.setFilename(unfinished_.c_str());
+NewRaster::NewRaster(const std::string& name, const RasterDescription& description)
+    : target_{resolved(name)}, side_file_{resolved(name + ".hdr")} {
+    for (const std::string& file : {target_, side_file_}) {
+        if (!can_be_replaced(file)) throw Failure(file + ": is no regular file");
+    }
+    const std::string ending = ".unfinished." + std::to_string(getpid());
+    const std::string unfinished = target_ + ending;
+    if (std::max(unfinished.size(), side_file_.size() + ending.size()) > kLongestName) {
+        throw Failure(name + ": name too long");
+    }
+    file_.copyDescription(description);
+    file_.setFilename(unfinished.c_str());
     file_.open(BufferFile::WRITE);
-    if (!file_.is_open()) {
-        unfinished_.clear();
-        throw Failure(name_ + ": cannot be created");
-    }
-    // Blocks that cannot be written are found by the length of what was written.
-}
-
-void NewRaster::commit() {
-    file_.close();
-    std::error_code error;
-    const auto length = std::filesystem::file_size(unfinished_, error);
-    if (error || length != static_cast<std::uintmax_t>(file_.rasterSize())) {
-        throw Failure(name_ + ": cannot be written, is the disk full?");
-    }
-    std::filesystem::rename(unfinished_, name_, error);
-    if (error) throw Failure(name_ + ": " + error.message());
-    unfinished_.clear();
-    file_.setFilename(name_.c_str());
-    if (file_.writehdr() != QUO_OK) throw Failure(name_ + ".hdr: cannot be written");
+    if (!file_.is_open()) throw Failure(name + ": cannot be created");
+    unfinished_ = unfinished;
+    unfinished_side_file_ = side_file_ + ending;
 }
 
 NewRaster::~NewRaster() {
     file_.close();
-    if (!unfinished_.empty()) unlink(unfinished_.c_str());
+    for (const std::string& file : {unfinished_, unfinished_side_file_}) {
+        if (!file.empty()) unlink(file.c_str());
+    }
+}
+
+void NewRaster::fail() const {
+    throw_if_interrupted();
+    throw Failure(target_ + ": cannot be written, is the disk full?");
+}
+
+void NewRaster::require_length(std::int64_t length) const {
+    std::error_code error;
+    const auto there = std::filesystem::file_size(unfinished_, error);
+    if (error || there < static_cast<std::uintmax_t>(length)) fail();
+}
+
+void NewRaster::write_bytes(std::int64_t offset, const char* from, std::int64_t bytes) {
+    file_.seek(offset - file_.tell(), BufferFile::FROM_CURRENT);
+    if (file_.write(from, static_cast<int>(bytes)) != bytes) fail();
+}
+
+template <typename T>
+void NewRaster::write(const Tile& tile, const T* from) {
+    if constexpr (std::is_same_v<T, double> || std::is_same_v<T, dcomplex>) {
+        if (is_narrow(file_)) {
+            const auto samples = static_cast<std::size_t>(tile.samples);
+            narrow_.resize(samples * static_cast<std::size_t>(file_.element_sizeof()));
+            for (int line = 0; line < tile.lines; ++line) {
+                narrow(from + static_cast<std::size_t>(line) * samples, samples, narrow_.data());
+                write_bytes(sample_offset(file_, tile.first_line + line, tile.first_sample),
+                            reinterpret_cast<const char*>(narrow_.data()),
+                            static_cast<std::int64_t>(narrow_.size()));
+            }
+            return;
+        }
+    }
+    file_.writebuffer(from, tile.first_line, tile.lines, tile.first_sample, tile.samples);
+    // Tiles follow each other, so what a full disk did not take is missing at the end.
+    require_length(sample_offset(file_, tile.first_line + tile.lines - 1, tile.first_sample + tile.samples));
+}
+template void NewRaster::write(const Tile&, const float*);
+template void NewRaster::write(const Tile&, const double*);
+template void NewRaster::write(const Tile&, const fcomplex*);
+template void NewRaster::write(const Tile&, const dcomplex*);
+
+void NewRaster::write_side_file() {
+    std::error_code error;
+    if (kind_of(side_file_) == std::filesystem::file_type::regular &&
+        !std::filesystem::copy_file(side_file_, unfinished_side_file_, error)) {
+        throw Failure(side_file_ + ": " + error.message());
+    }
+    if (file_.writehdr(unfinished_side_file_.c_str()) != QUO_OK) throw Failure(side_file_ + ": cannot be written");
+}
+
+void NewRaster::give_name(std::string& unfinished, const std::string& target) {
+    std::error_code error;
+    std::filesystem::rename(unfinished, target, error);
+    if (error) throw Failure(target + ": " + error.message());
+    unfinished.clear();
+}
+
+void NewRaster::commit() {
+    file_.close();
+    require_length(file_.rasterSize());
+    if (!reaches_the_disk(unfinished_)) fail();
+    write_side_file();
+    give_name(unfinished_, target_);
+    give_name(unfinished_side_file_, side_file_);
 }
 
 }  // namespace tool

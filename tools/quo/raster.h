@@ -1,10 +1,12 @@
 #ifndef QUO_TOOL_RASTER_H
 #define QUO_TOOL_RASTER_H
 
+#include <algorithm>
+#include <cstddef>
 #include <cstdint>
-#include <optional>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "quo_base/datafile.h"
 
@@ -27,29 +29,86 @@ struct Cut {
  */
 Cut cut_of(std::string_view text, int length, const char* option);
 
-/** How many lines make a block of some megabytes. */
-int block_lines(std::int64_t bytes_per_line, int lines);
+/** A rectangle of a raster that is worked on at once. */
+struct Tile {
+    int first_line, lines, first_sample, samples;
+    [[nodiscard]] std::size_t size() const {
+        return static_cast<std::size_t>(lines) * static_cast<std::size_t>(samples);
+    }
+};
+/** Calls work(tile) for tiles of some megabytes that cover lines x samples, in the order of the file. A line that
+ * is longer than a tile is cut at multiples of `grain` samples, so that memory stays bounded whatever the shape.
+ */
+template <typename Work>
+void for_each_tile(int lines, int samples, int grain, Work work) {
+    constexpr int kTileSamples = 1 << 19;
+    const int across = std::min(samples, std::max(grain, kTileSamples / grain * grain));
+    const int down = across < samples ? 1 : std::clamp(kTileSamples / std::max(samples, 1), 1, std::max(lines, 1));
+    for (int line = 0; line < lines; line += std::min(down, lines - line)) {
+        for (int sample = 0; sample < samples; sample += std::min(across, samples - sample)) {
+            work(Tile{line, std::min(down, lines - line), sample, std::min(across, samples - sample)});
+        }
+    }
+}
+
+/** A raster that is read tile by tile, whatever its cell type. */
+class RasterReader {
+public:
+    /** Throws Failure where the raster cannot be opened. */
+    RasterReader(std::string name, const RasterDescription& description);
+
+    [[nodiscard]] const RasterDescription& description() const { return file_; }
+    /** Reads a tile, packed, as float, double, fcomplex or dcomplex; complex samples of a real raster have the
+     * imaginary part 0. Throws Failure, also for complex samples as real ones. */
+    template <typename T>
+    void read(const Tile& tile, T* to);
+    /** Reads `bytes` bytes from `offset` on. Throws Failure. */
+    void read_bytes(std::int64_t offset, char* to, std::int64_t bytes);
+
+private:
+    [[noreturn]] void fail() const;
+
+    std::string name_;
+    BufferFile file_;
+    std::vector<double> real_;         // of a tile that is read as complex
+    std::vector<signed char> narrow_;  // a line of 8-bit parts
+};
 
 /** A raster under construction: written beside its final name, named and described by commit(). Whatever happens
  * before, an older raster of that name stays whole and the unfinished one is taken away. */
 class NewRaster {
 public:
-    /** The description is `like` but for what the caller changes in file() before the first write. */
-    NewRaster(const std::string& name, const RasterDescription& like);
+    /** Throws Failure where there can be no raster of that name. */
+    NewRaster(const std::string& name, const RasterDescription& description);
     ~NewRaster();
     NewRaster(const NewRaster&) = delete;
     NewRaster& operator=(const NewRaster&) = delete;
 
-    BufferFile& file() { return file_; }
-    /** Creates the file, of its final length. */
-    void open();
-    /** The raster is complete: it takes its name, then its side file is written. */
+    [[nodiscard]] const RasterDescription& description() const { return file_; }
+    /** Writes a tile of double, dcomplex or, for FLOAT32 and FLOAT_COMPLEX, float and fcomplex. Tiles come in the
+     * order of for_each_tile. Values for integers are rounded half away from zero and held at the bounds. Throws
+     * Failure where the disk does not take it. */
+    template <typename T>
+    void write(const Tile& tile, const T* from);
+    /** Writes bytes from `offset` on. Throws Failure. */
+    void write_bytes(std::int64_t offset, const char* from, std::int64_t bytes);
+    /** The raster is complete: it takes its name, and then its side file does, in which other sections stay. */
     void commit();
 
 private:
-    std::string name_, unfinished_;
+    void write_side_file();
+    void require_length(std::int64_t length) const;
+    static void give_name(std::string& unfinished, const std::string& target);
+    [[noreturn]] void fail() const;
+
+    std::string target_, side_file_;
+    std::string unfinished_, unfinished_side_file_;  // empty while there is no such file to take away
     BufferFile file_;
+    std::vector<signed char> narrow_;  // a line of 8-bit parts
 };
+
+/** Where a sample stands in the file; the prefix of its line ends at sample 0. */
+std::int64_t sample_offset(const RasterDescription& raster, std::int64_t line, std::int64_t sample);
 
 }  // namespace tool
 

@@ -3,24 +3,10 @@
 #include <cmath>
 #include <filesystem>
 
+#include "document.h"
 #include "failure.h"
-#include "quo_base/quorelxml_v2.h"
 
 namespace tool {
-namespace {
-
-/** Asks a file whether it is a header document. */
-class Document : private quorelxml {
-public:
-    static bool in(const std::string& file) {
-        Document document;
-        document.storeFileName(file.c_str());
-        return document.parse() == QUO_OK && document.isRecognized();
-    }
-};
-
-}  // namespace
-
 void read_region(const std::string& header, ROI_Obj& region) {
     const bool found = region.read_roi(header.c_str(), "ROI") == QUO_OK && region.isNULL() == 0;
     const double sum = region.FastStartTime + region.FastTimeLength + region.SlowStartTime + region.SlowTimeLength;

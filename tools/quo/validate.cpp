@@ -1,21 +1,25 @@
+#include <algorithm>
 #include <cmath>
 #include <filesystem>
 #include <memory>
 #include <nlohmann/json.hpp>
+#include <numeric>
 #include <string_view>
 #include <vector>
 
 #include "commands.h"
+#include "document.h"
+#include "earth.h"
 #include "failure.h"
 #include "number.h"
 #include "output.h"
 #include "product.h"
 #include "raster.h"
+#include "scene.h"
 
 namespace tool {
 namespace {
 
-constexpr double kLightSpeed = 299792458.0;
 // What a satellite or an aircraft can do.
 constexpr double kSlowest_m_s = 20.0, kFastest_m_s = 12000.0;
 constexpr double kLowestRadius_m = 6.33e6, kHighestRadius_m = 6e7;
@@ -32,19 +36,25 @@ public:
     Validation(GeneralSAR& product, std::string header) : product_{product}, header_{std::move(header)} {}
 
     std::vector<Finding> run() {
+        if (Document::in(header_)) check_structure();
         check_presence();
         check_values();
         check_raster();
         check_sampling();
         check_region();
         check_orbit();
+        check_corners();
         check_polynomials();
         return std::move(findings_);
     }
 
 private:
+    // One error for a field is enough.
     void error(const char* object, const char* field, const std::string& reason) {
-        findings_.push_back({true, object, field, reason});
+        const auto same = [=](const Finding& finding) {
+            return finding.error && finding.object == object && finding.field == field;
+        };
+        if (std::ranges::none_of(findings_, same)) findings_.push_back({true, object, field, reason});
     }
     void warn(const char* object, const char* field, const std::string& reason) {
         findings_.push_back({false, object, field, reason});
@@ -53,7 +63,63 @@ private:
 
     void check_presence() {
         for (const GSObject object : {gsSamplingConstants, gsDataSetInfo, gsOrbit, gsBufferFile}) {
-            if (!has(object)) warn(section_of(object), "-", "is missing or incomplete");
+            const auto noted = [=](const Finding& finding) { return finding.object == section_of(object); };
+            const bool there = has(object) || (object == gsBufferFile && described_raster(product_) != nullptr);
+            if (!there && std::ranges::none_of(findings_, noted)) {
+                warn(section_of(object), "-", "is missing");
+            }
+        }
+    }
+
+    // The document as it stands, before the objects make numbers of its texts.
+    void check_structure() {
+        Document document{header_};
+        if (!document.has_channel()) return error("Channel", "-", "there is no channel 1");
+        for (int i = gsRoi; i < GeneralSAR::kObjects; ++i) {
+            const auto object = static_cast<GSObject>(i);
+            if (object != gsStateVectors) check_section(document, object);  // the orbit's section
+        }
+    }
+    void check_section(Document& document, GSObject object) {
+        const char* section = section_of(object);
+        const int times = document.count(section);
+        if (times < 1) return;
+        if (times > 1) warn(section, "-", "stands " + std::to_string(times) + " times");
+        const GeneralSAR_Base& elements = elements_of(product_, object);
+        bool complete = true;
+        for (int k = 0; k < elements.elementCount(); ++k) {
+            const parElement& element = *elements.element(k);
+            const std::string path = std::string{section} + "/" + element.name;
+            if (document.has(path)) {
+                check_texts(document, section, element, path);
+            } else if (element.mandatory) {
+                error(section, element.name, "is missing");
+                complete = false;
+            }
+        }
+        if (!has(object) && complete) error(section, "-", why_not(object));
+    }
+    std::string why_not(GSObject object) const {
+        if (object != gsOrbit) return "cannot be read";
+        try {
+            return Scene{header_}.findings().empty() ? "makes no orbit" : "makes no good orbit";
+        } catch (const Failure& failure) {
+            const std::string reason = failure.what();
+            return reason.starts_with(header_ + ": ") ? reason.substr(header_.size() + 2) : reason;
+        }
+    }
+    void check_texts(Document& document, const char* section, const parElement& element, const std::string& path) {
+        if (element.type == parElement::typeString) return;
+        const bool listed = element.count > 1 && !document.is_array(path);  // "1.5, 2.5", the older form of arrays
+        if (listed) return;
+        const std::vector<std::string> values = document.values(path);
+        for (const std::string& value : values) {
+            if (!finite_number(value))
+                return error(section, element.name, "\"" + value + "\" is no finite number");
+        }
+        if (element.count > 1 && values.size() != static_cast<std::size_t>(element.count)) {
+            error(section, element.name,
+                  "has " + std::to_string(values.size()) + " values, not " + std::to_string(element.count));
         }
     }
 
@@ -64,8 +130,8 @@ private:
         for (int i = gsRoi; i < GeneralSAR::kObjects; ++i) {
             const auto object = static_cast<GSObject>(i);
             if (object == gsOrbit || !has(object)) continue;  // the state vectors are looked at once
-            const GeneralSAR_Base& values = *product_.GSget(object);
-            const GeneralSAR_Base& defaults = *fresh.GSget(object);
+            const GeneralSAR_Base& values = elements_of(product_, object);
+            const GeneralSAR_Base& defaults = elements_of(fresh, object);
             for (int k = 0; k < values.elementCount(); ++k) {
                 check_element(section_of(object), *values.element(k), *defaults.element(k));
             }
@@ -104,8 +170,9 @@ private:
 
     // The raster is looked for beside its header only, under the header's own name.
     void check_raster() {
-        if (!has(gsBufferFile)) return;
-        const std::int64_t size = product_.bufferFile.rasterSize();
+        const RasterDescription* raster = described_raster(product_);
+        if (raster == nullptr) return;
+        const std::int64_t size = raster->rasterSize();
         if (size < 0) return error("RasterInfo", "-", "describes no possible raster");
         const auto name = raster_of(header_);
         if (!name) return warn("RasterInfo", "-", "the header is not named like a raster's side file");
@@ -133,12 +200,30 @@ private:
             warn("SamplingConstants", first_name, reason);
         }
     }
+    // Two values that describe the same thing.
+    void check_same(const char* object, const char* field, double value, const char* other, double expected) {
+        if (value > kUnknown && expected > kUnknown && std::abs(value - expected) > 1e-3 * std::abs(expected)) {
+            warn(object, field, exact(value) + ", but " + other + " is " + exact(expected));
+        }
+    }
+    void check_pulse(const SamplingConstants_Obj& sampling) {
+        if (!has(gsPulse)) return;
+        const SARPulse_Obj& pulse = product_.pulse;
+        check_same("Pulse", "PulseSamplingRate", pulse.PulseSamplingRate, "SamplingConstants/frg_hz",
+                   sampling.frg_hz);
+        check_same("Pulse", "Bandwidth", pulse.Bandwidth, "SamplingConstants/Brg_hz", sampling.Brg_hz);
+        if (pulse.PulseKRate > kUnknown && pulse.PulseLength > 0.0) {
+            check_same("Pulse", "PulseKRate", std::abs(pulse.PulseKRate) * pulse.PulseLength,
+                       "times PulseLength, Bandwidth", pulse.Bandwidth);
+        }
+    }
     void check_sampling() {
         if (!has(gsSamplingConstants)) return;
         const SamplingConstants_Obj& s = product_.samplingConstants;
         check_product("lambda_m", s.lambda_m, "fc_hz", s.fc_hz, kLightSpeed);
         check_product("pri_s", s.pri_s, "prf_hz", s.prf_hz, 1.0);
         check_product("Trg_s", s.Trg_s, "frg_hz", s.frg_hz, 1.0);
+        check_pulse(s);
         if (s.Brg_hz > s.frg_hz && s.frg_hz > 0.0)
             error("SamplingConstants", "Brg_hz", "is larger than the sampling rate");
         if (s.Baz_hz > s.prf_hz && s.prf_hz > 0.0) warn("SamplingConstants", "Baz_hz", "is larger than the PRF");
@@ -155,7 +240,7 @@ private:
         if (std::abs(length - step * count) > 0.5 * step) {
             error("ROI", length_name, exact(length) + " is not " + exact(step) + " x " + std::to_string(count));
         }
-        if (has(gsBufferFile) && raster != count) {
+        if (raster != count) {
             warn("ROI", count_name, std::to_string(count) + ", but the raster has " + std::to_string(raster));
         }
     }
@@ -163,10 +248,16 @@ private:
         if (!has(gsRoi)) return;
         const ROI_Obj& roi = product_.roi.Roi;
         if (roi.isNULL() != 0) return warn("ROI", "-", "is empty");
+        const RasterDescription* raster = described_raster(product_);
         check_axis("FastTimeLength", roi.FastTimeLength, roi.FastTimeDelta, roi.Samples, "Samples",
-                   product_.bufferFile.NrOfPixelsPerLine);
+                   raster != nullptr ? raster->NrOfPixelsPerLine : roi.Samples);
         check_axis("SlowTimeLength", roi.SlowTimeLength, roi.SlowTimeDelta, roi.Lines, "Lines",
-                   product_.bufferFile.NrOfLinesPerImage);
+                   raster != nullptr ? raster->NrOfLinesPerImage : roi.Lines);
+        if (has(gsSamplingConstants) && product_.dataSetInfo.IsProjection(DataSetInfo_Obj::dsSlantRange) &&
+            product_.dataSetInfo.RangeLooks == 1) {
+            check_same("ROI", "FastTimeDelta", roi.FastTimeDelta, "SamplingConstants/Trg_s",
+                       product_.samplingConstants.Trg_s);
+        }
         if (!(roi.FastStartTime > 0.0))
             error("ROI", "FastStartTime", exact(roi.FastStartTime) + " is not above 0");
     }
@@ -212,8 +303,33 @@ private:
         }
     }
 
+    // Corners are geolocated on the ellipsoid; the ground's height shifts them by a few kilometres at most.
+    void check_corners() {
+        constexpr double kFar_m = 2e4;
+        const std::vector<Corner> grid = grid_corners(product_), orbit = orbit_corners(product_);
+        if (grid.empty() || orbit.empty()) return;
+        for (const Corner& corner : grid) {
+            const Vector place = position({corner.latitude_deg, corner.longitude_deg, 0.0});
+            const auto distance_m = [&](const Corner& other) {
+                return norm(position({other.latitude_deg, other.longitude_deg, 0.0}) - place);
+            };
+            const double nearest_m = distance_m(*std::ranges::min_element(orbit, {}, distance_m));
+            if (nearest_m > kFar_m) {
+                return warn(
+                    "GroundCornersPoints", "-",
+                    "a corner lies " + rough(nearest_m / 1e3) + " km from where the orbit sees the region's");
+            }
+        }
+    }
+
     template <typename P>
     void check_order(const char* name, const P& list, int count) {
+        for (int i = 0; i < count; ++i) {
+            const double sum =
+                std::accumulate(std::begin(list[i].pol), std::end(list[i].pol), list[i].trg0 + list[i].taz0);
+            if (!std::isfinite(sum))
+                return error("PolySAR", name, "polynomial " + std::to_string(i) + " is not finite");
+        }
         for (int i = 1; i < count; ++i) {
             if (!(list[i].taz0 > list[i - 1].taz0)) {
                 return error("PolySAR", name,
@@ -249,10 +365,13 @@ int validate(const std::string& header, bool json) {
         errors += finding.error ? 1 : 0;
         list.push_back(
             {{"kind", kind}, {"object", finding.object}, {"field", finding.field}, {"reason", finding.reason}});
-        text += std::string{kind} + "  " + finding.object + "/" + finding.field + "  " + finding.reason + "\n";
+        text += one_line(std::string{kind} + "  " + finding.object + "/" + finding.field + "  " + finding.reason) +
+                "\n";
     }
-    text += std::to_string(errors) + " errors, " + std::to_string(static_cast<int>(findings.size()) - errors) +
-            " warnings\n";
+    const auto count = [](int number, const char* what) {
+        return std::to_string(number) + " " + what + (number == 1 ? "" : "s");
+    };
+    text += count(errors, "error") + ", " + count(static_cast<int>(findings.size()) - errors, "warning") + "\n";
     Output output{"-"};
     output.write(json ? list.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n" : text);
     output.commit();

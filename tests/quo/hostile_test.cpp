@@ -1,0 +1,211 @@
+// What files, disks and users can do to the verbs that read rasters or write files.
+#include <fcntl.h>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <csignal>
+#include <cstdlib>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+#include "raster_folder.h"
+
+namespace {
+
+using testing::HasSubstr;
+
+class HostileFiles : public test::RasterFolder {
+protected:
+    // The verbs that open a raster.
+    [[nodiscard]] std::vector<std::vector<std::string>> jobs_on(const std::string& raster) const {
+        return {{"convert", raster, file("out.raw")}, {"quicklook", raster, file("out.png")}, {"vrt", raster}};
+    }
+    void expect_refused(const std::string& raster, const std::string& cause) const {
+        const auto before = files();
+        for (const auto& job : jobs_on(raster)) {
+            SCOPED_TRACE(job.front());
+            const test::Finished finished = test::quo(job);
+            EXPECT_EQ(finished.exit_status, 1);
+            ASSERT_EQ(finished.messages().size(), 1U) << finished.err;
+            EXPECT_THAT(finished.err, HasSubstr(cause));
+            EXPECT_EQ(files(), before);
+        }
+    }
+};
+
+struct Description {
+    std::vector<std::pair<const char*, const char*>> fields;
+    const char* cause;
+};
+TEST_F(HostileFiles, DescriptionsThatMakeNoRasterAreRefused) {
+    const char *const most = "2147483647", *const impossible = "describes no possible raster";
+    const Description rows[] = {
+        {{{"CellType", "-1"}}, impossible},
+        {{{"CellType", "42"}}, impossible},
+        {{{"NrOfLinesPerImage", "-4"}}, impossible},
+        {{{"NrOfPixelsPerLine", "-5"}}, impossible},
+        {{{"RowPrefix", "-1"}}, impossible},
+        {{{"HeaderOffset", "-1"}}, impossible},
+        {{{"NrOfLinesPerImage", most}, {"NrOfPixelsPerLine", most}, {"CellType", "2"}}, impossible},  // 2^66 bytes
+        {{{"NrOfLinesPerImage", most}}, "its description needs"},                                     // 2^34
+        {{{"NrOfLinesPerImage", "5"}}, "has 40 bytes, its description needs 50"},
+        {{{"HeaderOffset", most}}, "its description needs"},
+    };
+    for (const Description& row : rows) {
+        const std::string in = make("in.raw", 4, 5, INT16, 0);
+        for (const auto& [field, value] : row.fields) {
+            SCOPED_TRACE(std::string{field} + " " + value);
+            ASSERT_EQ(test::quo({"set", in + ".hdr", std::string{"RasterInfo/"} + field, value}).exit_status, 0);
+        }
+        SCOPED_TRACE(row.fields.front().first);
+        expect_refused(in, row.cause);
+        EXPECT_EQ(test::quo({"info", in + ".hdr"}).exit_status, 0);
+        EXPECT_EQ(test::quo({"validate", in + ".hdr"}).exit_status, 1);
+    }
+}
+
+TEST_F(HostileFiles, FoldersAreNoRasters) {
+    const std::string in = make("in.raw", 4, 5, INT16, 0);
+    std::filesystem::remove(in);
+    std::filesystem::create_directory(in);
+    expect_refused(in, "in.raw: Is a directory");
+    EXPECT_EQ(test::quo({"validate", in + ".hdr"}).exit_status, 1);
+}
+
+// A header belongs to the raster beside it; no name that stands in one is followed.
+TEST_F(HostileFiles, NamesInHeadersAreNotFollowed) {
+    const std::string in = make("in.raw", 4, 5, INT16, 0), bytes = test::read_text(in);
+    for (const char* field : {"RasterInfo/FileName", "RasterInfo/SourceFilename"}) {
+        ASSERT_EQ(test::quo({"set", in + ".hdr", field, "../../../../../etc/passwd", "--create"}).exit_status, 0);
+    }
+    for (const auto& job : jobs_on(in)) EXPECT_EQ(test::quo(job).exit_status, 0);
+    EXPECT_TRUE(test::read_text(file("out.raw")) == bytes);
+    EXPECT_THAT(test::read_text(in + ".vrt"), Not(HasSubstr("passwd")));
+    EXPECT_EQ(test::quo({"validate", in + ".hdr"}).exit_status, 0);
+}
+
+// Runs the tool while no file may grow beyond `blocks` units of the shell; its messages, then "exit N".
+std::string with_room(int blocks, const std::vector<std::string>& arguments) {
+    std::vector<std::string> all{"-c",
+                                 "trap '' XFSZ; { (ulimit -f " + std::to_string(blocks) +
+                                     R"(; exec "$0" "$@"); echo "exit $?"; } 2>&1 | cat)",
+                                 QUO_TOOL};
+    all.insert(all.end(), arguments.begin(), arguments.end());
+    return test::Child{"/bin/sh", all}.wait().out;
+}
+
+TEST_F(HostileFiles, FullDisksLeaveOlderFilesWhole) {
+    const std::string in = make("in.raw", 40, 30, INT16, 0), older = "older";
+    const std::string header = file("scene.xml"), scene = test::scene_file(test::scenes().front());
+    test::write_text(header, test::read_text(scene));
+    for (const char* name : {"out.raw", "out.png", "out.csv", "in.raw.vrt"}) test::write_text(file(name), older);
+    test::write_text(file("points.csv"), "azimuth_time_s,range_time_s\n1167930360,0.0054\n");
+    const std::vector<std::vector<std::string>> jobs{
+        {"convert", in, file("out.raw")},
+        {"quicklook", in, file("out.png")},
+        {"vrt", in},
+        {"set", header, "SamplingConstants/prf_hz", "17"},
+        {"derive", header},
+        {"coregister", scene, scene, "-o", header},
+        {"geolocate", scene, "--to", "ground", "--input", file("points.csv"), "--output", file("out.csv")},
+    };
+    const auto before = files();
+    for (const auto& job : jobs) {
+        SCOPED_TRACE(job.front());
+        const std::string said = with_room(0, job);
+        EXPECT_THAT(said, testing::MatchesRegex("quo: [^\n]*\nexit 1\n"));
+        EXPECT_EQ(files(), before);
+    }
+    for (const char* name : {"out.raw", "out.png", "out.csv", "in.raw.vrt"})
+        EXPECT_EQ(test::read_text(file(name)), older);
+    EXPECT_EQ(test::read_text(header), test::read_text(scene));
+}
+
+// However far the disk lets it come.
+TEST_F(HostileFiles, ConversionsThatRunOutOfRoomLeaveTheOlderPairWhole) {
+    const std::string in = make("in.raw", 60, 50, INT16, 0, 9), out = make("out.raw", 7, 5, INT32, 1);
+    const std::string raster = test::read_text(out), side_file = test::read_text(out + ".hdr");
+    const auto before = files();
+    std::string said;
+    for (int blocks = 0; said != "exit 0\n"; ++blocks) {
+        ASSERT_LT(blocks, 20) << said;
+        EXPECT_EQ(test::read_text(out), raster);
+        EXPECT_EQ(test::read_text(out + ".hdr"), side_file);
+        said = with_room(blocks, {"convert", in, out});
+        EXPECT_EQ(files(), before);
+    }
+    EXPECT_TRUE(test::read_text(out) == test::read_text(in));
+}
+
+TEST_F(HostileFiles, AFullStandardOutputIsAFailure) {
+    const std::string scene = test::scene_file(test::scenes().front());
+    for (const std::string job : {"info", "validate", "footprint", "orbit", "get"}) {
+        std::vector<std::string> arguments{"-c", R"(exec "$0" "$@" > /dev/full)", QUO_TOOL, job, scene};
+        if (job == "get") arguments.emplace_back("SamplingConstants/prf_hz");
+        const test::Finished finished = test::Child{"/bin/sh", arguments}.wait();
+        EXPECT_EQ(finished.exit_status, 1) << job;
+        EXPECT_EQ(finished.err, "quo: standard output: No space left on device\n");
+    }
+}
+
+// One line of 100 million samples: were it held whole, it would take 400 to 800 MB.
+TEST_F(HostileFiles, LongLinesAreReadInPieces) {
+    constexpr long kMost_kib = 200 * 1024;
+    const std::string in = make_sparse("in.raw", 1, 100'000'000, INT16);
+    const test::Finished seen = test::quo({"quicklook", in, file("out.png"), "--looks", "1x70001"});
+    EXPECT_EQ(seen.exit_status, 0) << seen.err;
+    EXPECT_LT(seen.peak_kib, kMost_kib);
+    const test::Finished cut =
+        test::quo({"convert", in, file("out.raw"), "--samples", ":30000001", "--type", "FLOAT32"});
+    EXPECT_EQ(cut.exit_status, 0) << cut.err;
+    EXPECT_LT(cut.peak_kib, kMost_kib);
+    EXPECT_EQ(std::filesystem::file_size(file("out.raw")), 120'000'004U);
+}
+
+/** A terminal for a child process to write to. */
+class Terminal {
+public:
+    Terminal() : master_{posix_openpt(O_RDWR | O_NOCTTY)} {
+        if (master_ < 0 || grantpt(master_) != 0 || unlockpt(master_) != 0)
+            throw std::runtime_error{"no terminal"};
+    }
+    ~Terminal() { close(master_); }
+    Terminal(const Terminal&) = delete;
+    Terminal& operator=(const Terminal&) = delete;
+
+    [[nodiscard]] const char* name() const { return ptsname(master_); }
+    // What has been written once `end` is part of it, or nobody writes any more.
+    std::string read_until(const std::string& end) const {
+        std::string text;
+        char piece[256];
+        while (text.find(end) == std::string::npos) {
+            const ssize_t got = read(master_, piece, sizeof piece);
+            if (got <= 0) break;
+            text.append(piece, static_cast<std::size_t>(got));
+        }
+        return text;
+    }
+
+private:
+    int master_;
+};
+
+// 32 GB to be read, of which the user sees the beginning.
+TEST_F(HostileFiles, ConversionsShowTheirProgressAndCanBeInterrupted) {
+    const std::string in = make_sparse("in.raw", 400'000'000, 40, INT16), out = file("out.raw");
+    test::write_text(out, "older");
+    const auto before = files();
+    const Terminal terminal;
+    test::Child child{QUO_TOOL, {"convert", in, out, "--samples", "3:4"}, "", terminal.name()};
+    const std::string shown = terminal.read_until("left");
+    EXPECT_THAT(shown, testing::ContainsRegex("[0-9]+ %  [0-9]+ MB/s  [0-9:]+ left"));
+    EXPECT_EQ(files().size(), before.size() + 1) << "the unfinished raster";
+    kill(child.id(), SIGINT);
+    EXPECT_EQ(child.wait().signal, SIGINT);
+    EXPECT_EQ(files(), before);
+    EXPECT_EQ(test::read_text(out), "older");
+}
+
+}  // namespace

@@ -1,0 +1,47 @@
+#ifndef QUO_TOOL_DOCUMENT_H
+#define QUO_TOOL_DOCUMENT_H
+
+#include <cstddef>
+#include <string>
+#include <vector>
+
+#include "quo_base/quorelxml_v2.h"
+
+namespace tool {
+
+/** A header document in memory: the fields of channel 1 as texts, by their path, such as
+ * "SamplingConstants/prf_hz". A path that is no chain of names is found nowhere. */
+class Document : private quorelxml {
+public:
+    static constexpr std::size_t kTextRoom = 1024;  ///< longest text, its end included
+
+    /** Throws Failure where the file is no header document: writing would put a fresh one in its place. */
+    explicit Document(const std::string& file);
+    /** Whether a file is a header document. */
+    static bool in(const std::string& file);
+
+    [[nodiscard]] bool has_channel() const { return channelExists(kChannel); }
+    [[nodiscard]] bool has(const std::string& path) const { return fieldExists(kChannel, path.c_str()); }
+    /** How many elements bear that path. */
+    [[nodiscard]] int count(const std::string& path) const { return countNodes(kChannel, path.c_str()); }
+    /** Whether the values of a field stand in `val` children. */
+    [[nodiscard]] bool is_array(const std::string& field) const { return count(field + "/val") > 0; }
+    /** The values of a field. Throws Failure where it is missing. */
+    std::vector<std::string> values(const std::string& field);
+    /** Replaces the values of a field in its own form; a single value that becomes several takes that of numeric
+     * arrays. Throws Failure. */
+    void replace(const std::string& field, const std::vector<std::string>& values);
+    /** Saves the document in one step. Throws Failure. */
+    void save();
+
+private:
+    static constexpr int kChannel = 1;
+
+    Document() = default;
+
+    std::string file_;
+};
+
+}  // namespace tool
+
+#endif
