@@ -10,25 +10,38 @@
 
 #include "products.h"
 #include "support/diagnostics.h"
+#include "support/full_disk.h"
 
 namespace {
 
 using test::differences, test::fill_product, test::present_in;
-using testing::ElementsAre, testing::HasSubstr, testing::IsEmpty;
+using testing::ElementsAre, testing::IsEmpty;
 
 class Product : public testing::Test {
 protected:
     /** A file in a folder of its own, so that names stay the same. */
-    std::string file(const char* folder, const char* name) {
+    std::string file(const char* folder, const char* name = "scene.hdr") {
         std::filesystem::create_directories(report_.file(folder));
         errno = 0;
         return report_.file(std::string{folder} + "/" + name);
     }
+    /** A filled product of which only one object is present. */
+    static void fill_only(GeneralSAR& product, GSObject object) {
+        fill_product(product);
+        for (const GSObject other : test::all_objects())
+            if (other != object) product.GSdisable(other);
+    }
+    static void expect_released(const GeneralSAR& product) {
+        EXPECT_EQ(product.polynomials.ndc, 0);
+        EXPECT_EQ(product.polynomials.DC, nullptr);
+        EXPECT_EQ(product.stateVectors.pSV_m, nullptr);
+        EXPECT_EQ(product.orbit.vSV_mOs, nullptr);
+        EXPECT_THAT(product.swathInfo.Swst_changes_bursts, IsEmpty());
+        EXPECT_THAT(product.swathInfo.BurstStartTimes, IsEmpty());
+        EXPECT_THAT(product.antennaPattern.Pattern, IsEmpty());
+    }
     const test::Report report_;
 };
-
-// --- objects and flags
-// --------------------------------------------------------------------------------------------
 
 TEST_F(Product, GivesEachObjectUnderItsNumber) {
     GeneralSAR p;
@@ -68,27 +81,7 @@ TEST_F(Product, GivesEachObjectUnderItsNumber) {
     }
 }
 
-// --- reading and writing
-// ------------------------------------------------------------------------------------------
-
 class ProductFile : public Product, public testing::WithParamInterface<const char*> {};
-
-TEST_P(ProductFile, ComesBackFieldByField) {
-    GeneralSAR source, target, again;
-    fill_product(source);
-    const std::string name = file("a", GetParam()), second = file("b", GetParam());
-    ASSERT_EQ(source.GSwrite(name.c_str()), 0);
-    ASSERT_EQ(target.GSread(name.c_str()), 0);
-    EXPECT_EQ(present_in(target), test::all_objects());
-    EXPECT_THAT(differences(source, target), IsEmpty());
-    EXPECT_THAT(target.swathInfo.Swst_changes_bursts, ElementsAre(0, 0, 0));
-    EXPECT_THAT(report_.entries("ERROR"), IsEmpty());
-
-    ASSERT_EQ(target.GSwrite(second.c_str()), 0);
-    EXPECT_EQ(test::read_text(second), test::read_text(name));
-    ASSERT_EQ(again.GSread(second.c_str()), 0);
-    EXPECT_THAT(differences(source, again), IsEmpty());
-}
 
 const char* const kOlderContent =
     "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<!-- kept -->\n<QuorelXmlDoc>\n"
@@ -105,36 +98,38 @@ void write_one_by_one(GeneralSAR& product, const std::string& name) {
     }
 }
 
-TEST_P(ProductFile, HasTheBytesOfWritingObjectByObject) {
+// Into whatever stands there, the bytes are those of writing object by object, what the product does not know
+// stays, and every field comes back.
+TEST_P(ProductFile, ComesBackFieldByFieldFromAnyFile) {
     GeneralSAR product;
     fill_product(product);
-    for (const char* older : {"", kOlderContent, "no header at all"}) {
+    for (const std::string older : {"", kOlderContent, "no header at all"}) {
+        GeneralSAR read, again;
         const std::string name = file("a", GetParam()), other = file("b", GetParam());
         for (const std::string& target : {name, other}) {
             std::filesystem::remove(target);
-            if (*older) test::write_text(target, older);
+            if (!older.empty()) test::write_text(target, older);
         }
+        errno = 0;
         ASSERT_EQ(product.GSwrite(name.c_str()), 0);
         write_one_by_one(product, other);
-        EXPECT_EQ(test::read_text(name), test::read_text(other));
-        EXPECT_EQ(test::read_text(file("a", "scene.hdr")), test::read_text(file("b", "scene.hdr")));
-    }
-}
+        const std::string text = test::read_text(name);
+        EXPECT_EQ(text, test::read_text(other));
+        EXPECT_EQ(test::read_text(file("a")), test::read_text(file("b")));
+        EXPECT_EQ(text.find("<Old>"), text.npos);
+        EXPECT_EQ(text.find("<Stray"), text.npos);
+        for (const char* kept : {"<!-- kept -->", "<Foreign unit=\"m\">", "<a>17.3</a>", "<a>-3.7</a>",
+                                 "<Unknown/>", "<Channel Number=\"2\">", "<PulseLength>803</PulseLength>"})
+            EXPECT_EQ(text.find(kept) != text.npos, older == kOlderContent) << kept;
 
-TEST_P(ProductFile, KeepsWhatItDoesNotKnow) {
-    GeneralSAR product, read;
-    fill_product(product);
-    const std::string name = file("a", GetParam());
-    test::write_text(name, kOlderContent);
-    ASSERT_EQ(product.GSwrite(name.c_str()), 0);
-    const std::string text = test::read_text(name);
-    for (const char* kept : {"<!-- kept -->", "<Foreign unit=\"m\">", "<a>17.3</a>", "<a>-3.7</a>", "<Unknown/>",
-                             "<Channel Number=\"2\">", "<PulseLength>803</PulseLength>"})
-        EXPECT_THAT(text, HasSubstr(kept));
-    EXPECT_EQ(text.find("<Old>"), text.npos);
-    EXPECT_EQ(text.find("<Stray"), text.npos);
-    ASSERT_EQ(read.GSread(name.c_str()), 0);
-    EXPECT_THAT(differences(product, read), IsEmpty());
+        ASSERT_EQ(read.GSread(name.c_str()), 0);
+        EXPECT_EQ(present_in(read), test::all_objects());
+        EXPECT_THAT(differences(product, read), IsEmpty());
+        EXPECT_THAT(read.swathInfo.Swst_changes_bursts, ElementsAre(0, 0, 0));
+        ASSERT_EQ(read.GSwrite(other.c_str()), 0);
+        EXPECT_EQ(test::read_text(other), text);
+    }
+    EXPECT_THAT(report_.messages("ERROR"), IsEmpty());
 }
 INSTANTIATE_TEST_SUITE_P(Names, ProductFile, testing::Values("scene.hdr", "scene.xml"),
                          [](const auto& row) { return std::string{row.param}.substr(6); });
@@ -142,7 +137,7 @@ INSTANTIATE_TEST_SUITE_P(Names, ProductFile, testing::Values("scene.hdr", "scene
 TEST_F(Product, WritesItsSectionsInReverseOrder) {
     GeneralSAR product;
     fill_product(product);
-    const std::string name = file("a", "scene.xml"), side = file("a", "scene.hdr");
+    const std::string name = file("a", "scene.xml"), side = file("a");
     ASSERT_EQ(product.GSwrite(name.c_str()), 0);
     const std::string text = test::read_text(name);
     const auto start = text.find("<Channel Number=\"1\">");
@@ -161,7 +156,7 @@ TEST_F(Product, SharesTheRasterSectionOfItsHeader) {
     GeneralSAR product, read;
     fill_product(product);
     product.bufferFile.NrOfPixelsPerLine = 29;
-    const std::string name = file("a", "scene.hdr");
+    const std::string name = file("a");
     ASSERT_EQ(product.GSwrite(name.c_str()), 0);
     const std::string text = test::read_text(name);
     EXPECT_EQ(text.find("<RasterInfo>"), text.rfind("<RasterInfo>"));
@@ -171,19 +166,17 @@ TEST_F(Product, SharesTheRasterSectionOfItsHeader) {
     EXPECT_EQ(read.dataFile.File.NrOfPixelsPerLine, 17);
 }
 
-// Each section alone: the object and those that need no section are there, nothing else.
+// Each object alone: its section brings it back, with those that share or need none, and a copy has it beside what
+// was there.
 TEST_F(Product, HasTheObjectsWhoseSectionsAreThere) {
     const std::string name = file("a", "scene.xml");
     for (const GSObject object : test::all_objects()) {
         SCOPED_TRACE(object);
-        GeneralSAR source, target;
-        fill_product(source);
-        for (const GSObject other : test::all_objects())
-            if (other != object) source.GSdisable(other);
+        GeneralSAR source, target, copy;
+        fill_only(source, object);
         std::filesystem::remove(name);
         source.GSwrite(name.c_str());
         if (object == gsDataFile) test::write_text(name, "");
-
         std::vector<GSObject> expected = {gsDataFile};
         if (object == gsStateVectors || object == gsOrbit) {
             expected.insert(expected.end(), {gsStateVectors, gsOrbit});
@@ -193,6 +186,13 @@ TEST_F(Product, HasTheObjectsWhoseSectionsAreThere) {
         // The antenna pattern needs its raster too, which the data file wrote at first.
         EXPECT_EQ(target.GSread(name.c_str()), 0);
         EXPECT_EQ(present_in(target), expected);
+
+        copy.GSenable(gsPulse);
+        copy.pulse.Bandwidth = 803457.3;
+        ASSERT_EQ(source.GSclone(&copy), 0);
+        EXPECT_TRUE(copy.GSexists(object) && copy.GSexists(gsPulse));
+        EXPECT_EQ(present_in(copy).size(), object == gsPulse ? 1U : 2U);
+        EXPECT_EQ(copy.pulse.Bandwidth, object == gsPulse ? source.pulse.Bandwidth : 803457.3);
     }
 }
 
@@ -211,39 +211,35 @@ TEST_F(Product, ReadsAnOldParameterFile) {
     EXPECT_EQ(product.dataFile.File.ByteOrder, 1);
 }
 
+// Names are text: never a format, and never cut into another message.
 TEST_F(Product, SaysThatAFileDoesNotExist) {
     GeneralSAR product, same;
     fill_product(product);
     fill_product(same);
-    const std::string name = report_.file("missing.xml");
-    EXPECT_EQ(product.GSread(name.c_str()), 1);
-    EXPECT_EQ(product.GSread(nullptr), 1);
+    const std::string missing = report_.file("missing.xml");
+    const char* const names[] = {missing.c_str(), nullptr, "%s%n%d"};
+    for (const char* name : names) EXPECT_EQ(product.GSread(name), 1);
     EXPECT_THAT(report_.messages("ERROR"),
-                ElementsAre("File : " + name + " DOES NOT EXIST!", "File :  DOES NOT EXIST!"));
+                ElementsAre("File : " + missing + " DOES NOT EXIST!", "File :  DOES NOT EXIST!",
+                            "File : %s%n%d DOES NOT EXIST!"));
+    EXPECT_EQ(product.GSread(std::string(5000, 'n').c_str()), 1);
     EXPECT_EQ(present_in(product), test::all_objects());
     EXPECT_THAT(differences(product, same), IsEmpty());
-    EXPECT_FALSE(std::filesystem::exists(name));
+    EXPECT_FALSE(std::filesystem::exists(missing));
 }
 
-// Names are text: never a format, and never cut into another message.
-TEST_F(Product, TakesNamesAsTheyStand) {
+TEST_F(Product, IsReleasedByReadingAndDestroying) {
     GeneralSAR product;
-    EXPECT_EQ(product.GSread("%s%n%d"), 1);
-    EXPECT_EQ(product.GSread(std::string(5000, 'n').c_str()), 1);
-    EXPECT_EQ(report_.messages("ERROR").front(), "File : %s%n%d DOES NOT EXIST!");
-}
-
-TEST_F(Product, ForgetsTheProductBefore) {
-    GeneralSAR product;
-    fill_product(product);
-    const std::string name = file("a", "empty.xml");
-    test::write_text(name, "");
-    EXPECT_EQ(product.GSread(name.c_str()), 0);
-    EXPECT_THAT(present_in(product), ElementsAre(gsDataFile));
-    EXPECT_EQ(product.polynomials.ndc, 0);
-    EXPECT_EQ(product.stateVectors.pSV_m, nullptr);
-    EXPECT_EQ(product.orbit.pSV_m, nullptr);
-    EXPECT_THAT(product.antennaPattern.Pattern, IsEmpty());
+    for (const bool reading : {true, false}) {
+        fill_product(product);
+        product.swathInfo.BurstStartTimes = {17.3};
+        const std::string name = file("a", "empty.xml");
+        test::write_text(name, "");
+        EXPECT_EQ(reading ? product.GSread(name.c_str()) : product.GSdestroy(), 0);
+        EXPECT_EQ(present_in(product), reading ? std::vector<GSObject>{gsDataFile} : test::all_objects());
+        expect_released(product);
+    }
+    EXPECT_EQ(product.GSdestroy(), 0);
 }
 
 TEST_F(Product, WritesNothingWhenNothingIsPresent) {
@@ -261,7 +257,7 @@ TEST_F(Product, WritesTheOthersOfAnObjectThatCannotBeWritten) {
     GeneralSAR product, read;
     fill_product(product);
     product.dataSetInfo.Track[0] = '\x01';
-    const std::string name = file("a", "scene.hdr"), other = file("b", "scene.hdr");
+    const std::string name = file("a"), other = file("b");
     EXPECT_EQ(product.GSwrite(name.c_str()), 0);
     write_one_by_one(product, other);
     EXPECT_EQ(test::read_text(name), test::read_text(other));
@@ -275,10 +271,14 @@ TEST_F(Product, Says0AndReportsWhereNothingCanBeWritten) {
     fill_product(product);
     EXPECT_EQ(product.GSwrite(report_.file("no_such_folder/scene.hdr").c_str()), 0);
     EXPECT_THAT(report_.messages("ERROR"), testing::Contains("File writing failed!"));
+    const std::string name = file("a");
+    test::write_text(name, kOlderContent);
+    {
+        const test::FullDisk full{1000};
+        EXPECT_EQ(product.GSwrite(name.c_str()), 0);
+    }
+    EXPECT_EQ(test::read_text(name), kOlderContent);
 }
-
-// --- links
-// --------------------------------------------------------------------------------------------------------
 
 TEST_F(Product, LinksItsObjectsAfterReading) {
     const struct { bool sampling, info; } rows[] = {{true, true}, {true, false}, {false, true}, {false, false}};
@@ -299,29 +299,9 @@ TEST_F(Product, LinksItsObjectsAfterReading) {
     }
 }
 
-// --- copying and clearing
-// -----------------------------------------------------------------------------------------
-
-TEST_F(Product, ClonesWhatIsPresent) {
-    for (const GSObject object : test::all_objects()) {
-        SCOPED_TRACE(object);
-        GeneralSAR source, target;
-        fill_product(source);
-        for (const GSObject other : test::all_objects())
-            if (other != object) source.GSdisable(other);
-        target.GSenable(gsPulse);
-        target.pulse.Bandwidth = 803457.3;
-        ASSERT_EQ(source.GSclone(&target), 0);
-        EXPECT_TRUE(target.GSexists(object));
-        EXPECT_TRUE(target.GSexists(gsPulse));
-        EXPECT_EQ(present_in(target).size(), object == gsPulse ? 1U : 2U);
-        EXPECT_EQ(target.pulse.Bandwidth, object == gsPulse ? source.pulse.Bandwidth : 803457.3);
-    }
-}
-
 TEST_F(Product, ClonesEveryField) {
     GeneralSAR source, target;
-    const std::string name = file("a", "scene.hdr"), copy = file("b", "scene.hdr");
+    const std::string name = file("a"), copy = file("b");
     fill_product(source);
     ASSERT_EQ(source.GSclone(&target), 0);
     EXPECT_EQ(present_in(target), test::all_objects());
@@ -335,31 +315,12 @@ TEST_F(Product, ClonesEveryField) {
     EXPECT_THAT(differences(source, target), IsEmpty());
 }
 
-TEST_F(Product, DestroysContentsAndKeepsFlags) {
-    GeneralSAR product;
-    fill_product(product);
-    product.swathInfo.BurstStartTimes = {17.3};
-    EXPECT_EQ(product.GSdestroy(), 0);
-    EXPECT_EQ(present_in(product), test::all_objects());
-    EXPECT_EQ(product.polynomials.ndc, 0);
-    EXPECT_EQ(product.polynomials.DC, nullptr);
-    EXPECT_EQ(product.stateVectors.pSV_m, nullptr);
-    EXPECT_EQ(product.orbit.vSV_mOs, nullptr);
-    EXPECT_THAT(product.swathInfo.Swst_changes_bursts, IsEmpty());
-    EXPECT_THAT(product.swathInfo.BurstStartTimes, IsEmpty());
-    EXPECT_THAT(product.antennaPattern.Pattern, IsEmpty());
-    EXPECT_EQ(product.GSdestroy(), 0);
-}
-
-// --- hostile headers
-// ----------------------------------------------------------------------------------------------
-
 // A header cut or with a byte changed anywhere is read without harm, and what it says of itself opens nothing: the
 // folder holds the same files afterwards.
 TEST_F(Product, ReadsDamagedHeaders) {
     GeneralSAR source, target;
     fill_product(source);
-    const std::string name = file("a", "scene.hdr");
+    const std::string name = file("a");
     ASSERT_EQ(source.GSwrite(name.c_str()), 0);
     const std::string whole = test::read_text(name);
     set_flg_report(0);

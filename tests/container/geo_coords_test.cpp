@@ -54,12 +54,7 @@ TEST_P(GeoCoords, AreTheRegionsCornersByOrbitDirection) {
     expect(grid_.SouthEast, up ? p2 : p3);
     expect(grid_.Center, sample(0.5, 0.5));
     EXPECT_EQ(grid_.EastingGridSize, 17.3);
-}
-
-class GeoCoordsToTheRight : public GeoCoords {};
-TEST_P(GeoCoordsToTheRight, NameTheCornersRightly) {
-    ASSERT_GE(orbit_.getLookSign(), 0);
-    ASSERT_EQ(orbit_.SVGetGeoCoords(&grid_, &roi_), 0);
+    if (orbit_.getLookSign() < 0) return;  // the names are right for a platform that looks to the right
     EXPECT_GT(grid_.NorthWest.Latitude, grid_.SouthWest.Latitude);
     EXPECT_GT(grid_.NorthEast.Latitude, grid_.SouthEast.Latitude);
     EXPECT_LT(grid_.NorthWest.Longitude, grid_.NorthEast.Longitude);
@@ -77,9 +72,6 @@ TEST_P(GeoCoords, KeepThePointsBeforeAFailure) {
 }
 INSTANTIATE_TEST_SUITE_P(Scenes, GeoCoords, testing::ValuesIn(test::kScenes),
                          [](const auto& row) { return row.param.name; });
-INSTANTIATE_TEST_SUITE_P(Scenes, GeoCoordsToTheRight, testing::Values(test::kScenes[0], test::kScenes[1]),
-                         [](const auto& row) { return row.param.name; });
-
 TEST(GeoCoordsWithoutOrbit, AreRefused) {
     const test::Report report;
     GeneralSAROrbit orbit;
