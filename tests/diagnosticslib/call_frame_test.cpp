@@ -158,14 +158,6 @@ TEST(CallFrame, OnlyAVerdictOfSuccessKeepsTheBlocks) {
     EXPECT_THAT(report.entries(), IsEmpty());
 }
 
-TEST(CallFrame, WorksWithoutTracking) {
-    exit_ckerr();
-    CallFrame frame{"f()", kSource};
-    TrackedBuffer<int> numbers{17};
-    ASSERT_TRUE(numbers);
-    EXPECT_EQ(frame.success(), 0);
-}
-
 // ---- The buffer
 
 TEST(TrackedBuffer, IsZeroFilledAndReleased) {
