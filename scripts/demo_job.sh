@@ -13,3 +13,5 @@ echo
 echo "One sample of the second scene, brought to the ground:"
 printf 'azimuth_time_s,range_time_s\n1133090050.25,0.0058123\n' |
     "$quo" geolocate "$scenes/s1a_iw_grd_20201127_desc_sea.xml" --to ground
+
+scripts/demo_product.sh "$1"
