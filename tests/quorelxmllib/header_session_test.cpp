@@ -67,10 +67,11 @@ TEST_F(HeaderSessionTest, WritesTheBytesOfObjectByObject) {
 TEST_F(HeaderSessionTest, ParsesOnce) {
     write_text(file_, Shelf::text());
     const HeaderSession session{file_.c_str()};
-    EXPECT_TRUE(read(file_, "Shelf"));
-    std::filesystem::remove(file_);
-    EXPECT_TRUE(read(file_, "Shelf"));
-    EXPECT_FALSE(read(file_, "None"));
+    for (int round = 0; round < 2; ++round) {
+        EXPECT_TRUE(read(file_, "Shelf"));
+        EXPECT_FALSE(read(file_, "None"));
+        std::filesystem::remove(file_);
+    }
     char name[32];
     EXPECT_TRUE(object_.getConfigurationFile(file_.c_str(), 1, "Shelf", name, sizeof name));
 }

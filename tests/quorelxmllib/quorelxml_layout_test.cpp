@@ -180,17 +180,4 @@ TEST_F(QuorelxmlLayout, RemovesAWholeField) {
     EXPECT_EQ(inside(saved()), "<Keep><Sec/></Keep>");
 }
 
-// With a look-up or a count per value this would take minutes.
-TEST_F(QuorelxmlLayout, HandlesLongArrays) {
-    constexpr int kCount = 200000;
-    std::vector<std::int32_t> values(kCount), back(kCount);
-    for (int i = 0; i < kCount; ++i) values[static_cast<std::size_t>(i)] = 7 * i - 3;
-    OpenDocument& document = load(header_text(""));
-    EXPECT_EQ(document.writeInt(1, "Sec/Arr", values.data(), kCount), 0);
-    EXPECT_EQ(document.write(), 0);
-    EXPECT_EQ(document.initXmlFile(file_.c_str()), 0);
-    EXPECT_EQ(document.readInt(1, "Sec/Arr", back.data(), kCount), 0);
-    EXPECT_EQ(back, values);
-}
-
 }  // namespace

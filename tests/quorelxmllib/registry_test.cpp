@@ -156,38 +156,34 @@ TEST_F(Registry, MakesOneTableForAClassOfClasses) {
 // --- reading and writing ----------------------------------------------------------------------------------------
 
 TEST_F(Registry, WritesItsSectionOnceAndKeepsTheOthers) {
-    std::int32_t n = 3;
-    double values[] = {1.5, 2.5, 3.5};
-    char text[512] = "a < b";
-    char one[512] = "x", two[512] = "";
+    std::int32_t n = 2;
+    double values[] = {1.5, 2.5};
+    char one[512] = "a < b", two[512] = "";
     char* texts[] = {one, two};
     Free object;
-    int count = 3;
     object.registration = [&](Free& self) {
-        self.addElementDouble("values", values, count, 0, 0, true);
+        self.addElementDouble("values", values, n, 0, 0, true);
         self.addElementInt("n", &n, 1, 0, 0, true);
-        self.addElementString("text", text, true);
+        self.addElementString("text", one, true);
         self.addElementString("texts", texts, 2, true);
     };
     object.createElementsVector(4);
-    write_text(file_,
-               header_text("    <S old=\"1\">\n      <gone/>\n    </S>\n    <T>\n      <kept/>\n    </T>\n"));
-    const std::string start = "    <T>\n      <kept/>\n    </T>\n    <S>\n";
-    const std::string end =
-        "      <text>a &lt; b</text>\n      <texts N=\"1\">x</texts>\n      <texts N=\"2\"/>\n    </S>\n";
-    const std::string values_text =
-        "      <values>\n        <val N=\"1\">1.5</val>\n        <val N=\"2\">2.5</val>\n"
-        "        <val N=\"3\">3.5</val>\n      </values>\n      <n>3</n>\n";
-    const std::string whole = header_text(start + values_text + end);
+    const std::string others = "    <T>\n      <kept/>\n    </T>\n",
+                      array =
+                          "      <values>\n        <val N=\"1\">1.5</val>\n        <val N=\"2\">2.5</val>\n"
+                          "      </values>\n      <n>2</n>\n",
+                      end =
+                          "      <text>a &lt; b</text>\n      <texts N=\"1\">a &lt; b</texts>\n"
+                          "      <texts N=\"2\"/>\n    </S>\n";
+    write_text(file_, header_text("    <S old=\"1\">\n      <gone/>\n    </S>\n" + others));
     for (int round = 0; round < 3; ++round) {
         EXPECT_EQ(object.writeAuxiliaryFile(file_.c_str(), 1, "S"), 0);
-        EXPECT_EQ(read_text(file_), whole);
+        EXPECT_EQ(read_text(file_), header_text(others + "    <S>\n" + array + end));
     }
-    count = n = 0;
+    n = 0;  // a length of 0 writes no array
     object.registration(object);
     EXPECT_EQ(object.writeAuxiliaryFile(file_.c_str(), 1, "S"), 0);
-    EXPECT_EQ(read_text(file_), header_text(start + "      <n>0</n>\n" + end))
-        << "no array element for a length of 0";
+    EXPECT_EQ(read_text(file_), header_text(others + "    <S>\n      <n>0</n>\n" + end));
 }
 
 TEST_F(Registry, ReadsSinglesThenAllocatesThenEverything) {
@@ -222,44 +218,7 @@ TEST_F(Registry, ReadsSinglesThenAllocatesThenEverything) {
     EXPECT_STREQ(text, "read");
 }
 
-TEST_F(Registry, FailsOnMandatoryElementsOnly) {
-    struct Row {
-        const char* inside;
-        bool scalar_mandatory, text_mandatory, array_mandatory, read;
-        const char* text;
-    };
-    const Row rows[] = {
-        {"<i>7</i><t>read</t><a>1, 2</a>", true, true, true, true, "read"},
-        {"<t>read</t><a>1, 2</a>", true, true, true, false, "default"},
-        {"<t>read</t><a>1, 2</a>", false, true, true, true, "read"},
-        {"<i>7</i><a>1, 2</a>", true, true, true, false, "default"},
-        {"<i>7</i><a>1, 2</a>", true, false, true, true, "default"},
-        {"<i>7</i><t>read</t>", true, true, true, false, "read"},
-        {"<i>7</i><t>read</t>", true, true, false, true, "read"},
-        {"", false, false, false, true, "default"},
-    };
-    for (const Row& row : rows) {
-        SCOPED_TRACE(row.inside);
-        std::int32_t i = -5;
-        char t[512] = "default";
-        double a[2] = {-1, -2};
-        Free object;
-        object.registration = [&](Free& self) {
-            self.addElementInt("i", &i, 1, 0, 0, row.scalar_mandatory);
-            self.addElementString("t", t, row.text_mandatory);
-            self.addElementDouble("a", a, 2, 0, 0, row.array_mandatory);
-        };
-        object.createElementsVector(3);
-        EXPECT_EQ(object.readAuxiliaryFile(file(row.inside).c_str(), 1, "S"), row.read);
-        EXPECT_EQ(i, std::strstr(row.inside, "<i>") ? 7 : -5) << "what was there is read, the rest stays";
-        EXPECT_STREQ(t, row.text);
-        EXPECT_EQ(a[1], row.read && std::strstr(row.inside, "<a>") ? 2 : -2);
-        if (!row.scalar_mandatory) continue;
-        EXPECT_FALSE(object.readAuxiliaryFile(file_.c_str(), 1, "Other"));
-        EXPECT_FALSE(object.readAuxiliaryFile(file_.c_str(), 2, "S"));
-    }
-}
-
+// Which elements may be missing is tested with the classes that have them.
 TEST_F(Registry, FailsWhenTheBuffersCannotBeHad) {
     const test::CapturedStderr quiet;
     std::int32_t i = 0;
@@ -319,22 +278,6 @@ TEST_F(Registry, RefusesBadFilesAndSections) {
     EXPECT_EQ(read_text(file_), before);
 }
 
-TEST_F(Registry, WritesAndReadsSectionsWithinSections) {
-    Shelf object, back;
-    object.fill(2);
-    EXPECT_EQ(object.writeAuxiliaryFile(file_.c_str(), 1, "Library/Room-2"), 0);
-    EXPECT_EQ(object.writeAuxiliaryFile(file_.c_str(), 2, "Library/Room-3"), 0);
-    EXPECT_TRUE(back.readAuxiliaryFile(file_.c_str(), 1, "Library/Room-2"));
-    EXPECT_FALSE(back.readAuxiliaryFile(file_.c_str(), 1, "Library/Room-3"));
-}
-
-TEST_F(Registry, DoesNotMakeAFileByReading) {
-    Shelf object;
-    EXPECT_FALSE(object.readAuxiliaryFile(folder_.file("none.xml").c_str(), 1, "Shelf"));
-    EXPECT_TRUE(object == Shelf{});
-    EXPECT_THAT(test::entries(folder_), testing::IsEmpty());
-}
-
 TEST_F(Registry, FindsTheConfigurationFile) {
     Free object;
     char whole[512] = "unset", cut[5] = "";
@@ -346,17 +289,6 @@ TEST_F(Registry, FindsTheConfigurationFile) {
     EXPECT_FALSE(object.getConfigurationFile(file_.c_str(), 2, "S", whole));
     EXPECT_FALSE(object.getConfigurationFile(folder_.file("none").c_str(), 1, "S", whole));
     EXPECT_STREQ(whole, "/etc/\xC3\xA8.xml");
-}
-
-TEST_F(Registry, WritesExactNumbersWhereAskedTo) {
-    Shelf object, back;
-    object.fill(2);
-    for (const bool exact : {true, false}) {
-        object.setExactNumbers(exact);
-        EXPECT_EQ(object.writeAuxiliaryFile(file_.c_str(), 1, "Shelf"), 0);
-        EXPECT_TRUE(back.readAuxiliaryFile(file_.c_str(), 1, "Shelf"));
-        EXPECT_EQ(back.width == object.width, exact);
-    }
 }
 
 }  // namespace
