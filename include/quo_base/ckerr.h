@@ -71,7 +71,7 @@ QUO_BASE_API void exit_ckerr(void) QUO_NOEXCEPT;
  * @return the open level if the report is open already, which stays as it is; the level (normally 0) while
  * tracking is off; level - 1 for a level outside 1 to 3, and 0 if the file cannot be opened: the report is closed
  * then (level 0). Otherwise the report is open, and the result is that of writing the banner: 0 or EOF. To tell
- *         success from failure, ask ckflg_report(). */
+ * success from failure, ask ckflg_report(). */
 QUO_BASE_API int init_report(const char* file_name, const char* title, int level) QUO_NOEXCEPT;
 
 /** Opens the log, as init_report() does the report: the file is created or emptied, but nothing written. A failure
@@ -121,7 +121,7 @@ QUO_BASE_API int quo_add_log(const char* text) QUO_NOEXCEPT;
 /** Allocates a block for the running function.
  * @return the block, uninitialised, owned by the caller; null if there is no memory or the table is full. Nothing
  * else is reported: that is the caller's business. A block that the system refused leaves a null entry in the
- *         table. */
+ * table. */
 QUO_BASE_API void* malloc_ckerr(size_t size) QUO_NOEXCEPT;
 
 /** As malloc_ckerr(), for `count` elements of `size` bytes, zero-filled. A product that overflows counts as

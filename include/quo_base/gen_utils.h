@@ -125,7 +125,7 @@ QUO_BASE_API void sec852mjd(double t, MjdRecord* record_out) QUO_NOEXCEPT;
  *
  * @param[out] text_out  28 bytes: the text and its terminating zero; unchanged unless 0 is returned
  * @return 0; or -1 with "Date should be later than 1-JAN-1985\n" on the standard error stream for a negative time,
- *         and with "Date should be earlier than 1-JAN-10000\n" for one beyond four-digit years or not-a-number. */
+ * and with "Date should be earlier than 1-JAN-10000\n" for one beyond four-digit years or not-a-number. */
 QUO_BASE_API int sec852myascii(double t, char* text_out) QUO_NOEXCEPT;
 
 /** sec85 or MJD record to the long date text, without the terminating zero: exactly 27 characters are written.
@@ -164,9 +164,9 @@ QUO_BASE_API int mystrcasecmp(const char* a, const char* b) QUO_NOEXCEPT;
 /** Moves a stream to a 64-bit offset from the start (whence 0), its present position (1) or its end (2).
  *
  * @return 0: what was written is flushed, the underlying descriptor stands at the new place, the stream reads
- *         and writes there, and its end-of-file flag is cleared. -1: no stream, another whence, an offset that
- *         overflows or lies before the start, or a failed flush or seek (whence 2 may then have moved the stream
- *         to its end). */
+ * and writes there, and its end-of-file flag is cleared. -1: no stream, another whence, an offset that
+ * overflows or lies before the start, or a failed flush or seek (whence 2 may then have moved the stream
+ * to its end). */
 QUO_BASE_API int myfseek64_msc(FILE* stream, int64_t offset64, int whence) QUO_NOEXCEPT;
 
 /** Removes one final slash or backslash in place. Returns the length before that. */

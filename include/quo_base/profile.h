@@ -39,7 +39,7 @@ QUO_BASE_C_BEGIN
  * value in the last section of that name, or adds the key at its end, or a new section at the end of the file.
  *
  * @return the value, owned by the store and valid until the key is changed or deleted or the file freed. Null when
- *         the key is not there, or when there is nothing to write (a null argument). */
+ * the key is not there, or when there is nothing to write (a null argument). */
 QUO_BASE_API const char* GetSetProfileChar(int write, const char* section, const char* key, const char* value,
                                            const char* file) QUO_NOEXCEPT;
 
