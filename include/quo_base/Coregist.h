@@ -48,7 +48,7 @@ public:
     double evaluateMAtimeAzimuth(double slaveRange, double slaveAzimuth) const;
 
     /** Makes the sample form from the time form. The sample origin becomes the master sample and line nearest to
-     * the time origin. 0; 1 when an interval is 0 or not finite, with everything unchanged. */
+     * the time origin. 0; 1 without a region or when an interval is 0 or not finite, with everything unchanged. */
     int Time2Samples(const ROI_Obj* master, const ROI_Obj* slave);
     /** The same for two images with common intervals, s. */
     int Time2Samples(double masterRangeStart, double masterAzimuthStart, double slaveRangeStart,

@@ -114,7 +114,7 @@ public:
      * section "RasterInfo" with CellType and ByteOrder as names. An open file is closed. 0; 1 when a key is
      * missing or the cell type unknown (CellType is then -1), with the values found taken over. */
     int read_hdr(const char* file_name);
-    /** Writes the side file in XML form. 0 or 1, with the old one whole. */
+    /** Writes the side file in XML form. 0; 1, also without a name, with the old one whole. */
     int write_hdr();
     /** Takes over another file's name and description, buffer size included; opens nothing. This file is closed
      * first. 0 or the status of the close. */
@@ -212,14 +212,15 @@ public:
 
     /** Reads the side file of this name; the raster's name is this name less its last four characters. 0 or 1. */
     int readhdr(const char* header_name) override;
-    /** Reads the side file of the raster. 0 or 1. */
+    /** Reads the side file of the raster. 0; 1 also without a name. */
     int readhdr();
-    /** Writes the side file of the raster. 0 or 1, with the old one whole. */
+    /** Writes the side file of the raster. 0; 1, also without a name, with the old one whole. */
     int writehdr() override;
     /** Writes a side file of this name. 0 or 1, with the old one whole. */
     int writehdr(const char* header_name) override;
 
-    void setFilename(const char* file_name);  ///< names the raster, cut to 511 bytes
+    void setFilename(
+        const char* file_name);  ///< names the raster; 512 bytes or more are no name: it becomes empty
     void getFilename(char* file_name) const;  ///< copies the name into a buffer of 512 bytes
     void setSamples(int samples) { NrOfPixelsPerLine = samples; }
     [[nodiscard]] int getSamples() const { return NrOfPixelsPerLine; }

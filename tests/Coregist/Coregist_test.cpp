@@ -139,6 +139,8 @@ TEST(Coregist, RefusesWhatHasNoInverse) {
     ROI_Obj empty;
     EXPECT_EQ(fit.Time2Samples(&empty, &empty), 1);
     EXPECT_EQ(fit.ConvertPolys(&empty, &empty), 1);
+    EXPECT_EQ(fit.Time2Samples(nullptr, &empty), 1);
+    EXPECT_EQ(fit.ConvertPolys(&empty, nullptr), 1);
     EXPECT_EQ(fit.RgFit[0], -1.0);
 }
 

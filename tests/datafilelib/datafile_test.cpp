@@ -78,6 +78,20 @@ TEST(SideFile, ComesBackFieldByFieldInBothClasses) {
     EXPECT_EQ(test::read_text(side), whole);
     EXPECT_EQ(buffer.readhdr("x"), 1);
     EXPECT_EQ(buffer.readhdr(report.file("missing.hdr").c_str()), 1);
+    std::filesystem::create_directory(report.file("folder.hdr"));
+    EXPECT_EQ(buffer.readhdr(report.file("folder.hdr").c_str()), 1);
+    EXPECT_EQ(data.read_hdr(report.file("folder").c_str()) + data.write_hdr(), 2);
+    // Names too long are none: neither another file's, nor that of a side file without a raster.
+    const std::string too_long = report.file(std::string(512, 'n'));
+    EXPECT_EQ(buffer.readhdr((too_long + ".hdr").c_str()), 1);
+    for (BufferFile* file : {&buffer, &buffer_cloned}) {
+        file->setFilename(too_long.c_str());
+        file->getFilename(copied);
+        EXPECT_STREQ(copied, "");
+        for (const int status : {file->readhdr(), file->writehdr(), read.copy(too_long.c_str()),
+                                 file->copy(too_long.c_str()), DataFile{}.write_hdr()})
+            EXPECT_EQ(status, 1);
+    }
 }
 
 struct ProfileHeader {

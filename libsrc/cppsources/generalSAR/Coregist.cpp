@@ -33,7 +33,7 @@ double value_of(const double (&c)[4], double fast, double slow) {
 
 /** Time of sample or line 0 and the time from one to the next, s. */
 struct Axis {
-    double start, interval;
+    double start = 0.0, interval = 0.0;
     [[nodiscard]] double time(double index) const { return start + index * interval; }
     [[nodiscard]] bool usable() const {
         return std::isfinite(start) && std::isfinite(interval) && interval != 0.0;
@@ -44,8 +44,10 @@ struct Grid {
     [[nodiscard]] bool usable() const { return fast.usable() && slow.usable(); }
 };
 
-Grid grid_of(const ROI_Obj& roi) {
-    return {{roi.FastStartTime, roi.FastTimeDelta}, {roi.SlowStartTime, roi.SlowTimeDelta}};
+/** One that is not usable where there is no region. */
+Grid grid_of(const ROI_Obj* roi) {
+    if (!roi) return {};
+    return {{roi->FastStartTime, roi->FastTimeDelta}, {roi->SlowStartTime, roi->SlowTimeDelta}};
 }
 
 // The polynomial `time`, moved by (fast, slow) from its origin, with inputs counted in the master's intervals and
@@ -154,7 +156,7 @@ double Coregist::evaluateMAtimeAzimuth(double slaveRange, double slaveAzimuth) c
 }
 
 int Coregist::Time2Samples(const ROI_Obj* master, const ROI_Obj* slave) {
-    return make_samples(*this, grid_of(*master), grid_of(*slave));
+    return make_samples(*this, grid_of(master), grid_of(slave));
 }
 int Coregist::Time2Samples(double masterRangeStart, double masterAzimuthStart, double slaveRangeStart,
                            double slaveAzimuthStart, double rangeInterval, double azimuthInterval) {
@@ -164,7 +166,7 @@ int Coregist::Time2Samples(double masterRangeStart, double masterAzimuthStart, d
 
 int Coregist::ConvertPolys(const ROI_Obj* master, const ROI_Obj* slave) {
     quo::CallFrame frame{"Coregist::ConvertPolys", kSource};
-    const Grid from = grid_of(*master), to = grid_of(*slave);
+    const Grid from = grid_of(master), to = grid_of(slave);
     if (!from.usable() || !to.usable()) return frame.fail(QUO_REFUSED, "A sampling interval is 0 or not finite");
     trg0 = from.fast.time(Rg_Samples_Origin);
     taz0 = from.slow.time(Az_Samples_Origin);

@@ -39,7 +39,10 @@ BufferFile::BufferFile(const char* file_name) : stream_{std::make_unique<quo::Ra
 }
 BufferFile::~BufferFile() { close(); }
 
-void BufferFile::setFilename(const char* file_name) { quo::copy_bounded(name_, quo::text_or_empty(file_name)); }
+void BufferFile::setFilename(const char* file_name) {
+    const std::string_view name = quo::text_or_empty(file_name);
+    quo::copy_bounded(name_, name.size() < sizeof name_ ? name : "");  // a cut name would be another file's
+}
 void BufferFile::getFilename(char* file_name) const { quo::copy_bounded(file_name, sizeof name_, name_); }
 bool BufferFile::is_open() const { return stream_->is_open(); }
 bool BufferFile::exists() const { return quo::raster_exists(name_); }
@@ -49,11 +52,16 @@ int BufferFile::readhdr(const char* header_name) {
     close();
     std::string_view name = quo::text_or_empty(header_name);
     name.remove_suffix(std::min(name.size(), kSideSuffix.size()));
-    quo::copy_bounded(name_, name);
-    return readSection(header_name);
+    setFilename(std::string{name}.c_str());
+    return name.empty() || name_[0] != '\0' ? readSection(header_name) : QUO_REFUSED;
 }
-int BufferFile::readhdr() { return readhdr((std::string{name_} + std::string{kSideSuffix}).c_str()); }
-int BufferFile::writehdr() { return writehdr((std::string{name_} + std::string{kSideSuffix}).c_str()); }
+// Without a name the side file would be some ".hdr" of the working directory.
+int BufferFile::readhdr() {
+    return name_[0] ? readhdr((std::string{name_} + std::string{kSideSuffix}).c_str()) : QUO_REFUSED;
+}
+int BufferFile::writehdr() {
+    return name_[0] ? writehdr((std::string{name_} + std::string{kSideSuffix}).c_str()) : QUO_REFUSED;
+}
 int BufferFile::writehdr(const char* header_name) { return writeSection(header_name); }
 
 void BufferFile::open(int mode) {
@@ -372,6 +380,7 @@ int BufferFile::copy(const char* file_name, int overwrite) {
     const QuietErrno quiet;
     flush();
     BufferFile target{file_name};
+    if (!target.name_[0]) return QUO_REFUSED;
     target.copyDescription(*this);
     if (const int status = quo::copy_raster(name_, target.name_, overwrite != 0)) return status;
     return target.writehdr();

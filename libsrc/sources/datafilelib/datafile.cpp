@@ -325,6 +325,8 @@ int DataFile::read_hdr(const char* file_name) {
 
 int DataFile::write_hdr() {
     quo::CallFrame frame{"DataFile::write_hdr", kSource};
+    // Without a name the side file would be some ".hdr" of the working directory.
+    if (FileName[0] == '\0') return frame.fail(QUO_REFUSED, "No raster named");
     if (writeSection(sideFile().c_str()) != QUO_OK) {
         return frame.fail(QUO_REFUSED, "The raster's side file cannot be written");
     }
