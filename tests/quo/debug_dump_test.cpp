@@ -33,7 +33,7 @@ std::string bytes_of(T... values) {
 // Every type code, read back from what write_debug itself wrote.
 TEST(DebugDump, ShowsTheValuesOfEveryType) {
     const Shown rows[] = {
-        {0, bytes_of(17.25F, -0.5F), "[17.25, -0.5]"},
+        {0, bytes_of(17.3F, -0.5F), "[17.3, -0.5]"},
         {1, bytes_of(0.1, -1e300), "[0.1, -1e300]"},
         {2, bytes_of(1.5F, -2.0F, 0.25F, 8.0F), "[[1.5, -2.0], [0.25, 8.0]]"},
         {3, bytes_of(0.1, 0.2, -0.3, 1e-300), "[[0.1, 0.2], [-0.3, 1e-300]]"},

@@ -1,5 +1,4 @@
 #include <algorithm>
-#include <charconv>
 #include <cstdint>
 #include <filesystem>
 #include <fstream>
@@ -63,20 +62,12 @@ std::unique_ptr<Record> record_of(const std::string& name) {
     throw WrongUse(name + ": no record; there are " + known);
 }
 
-/** A float as it is written by hand: 0.8, not 0.800000011920929. */
-double plain(float value) {
-    char room[32];
-    const auto [end, error] = std::to_chars(std::begin(room), std::end(room), value);
-    return error == std::errc{} ? finite_number({room, end}).value_or(static_cast<double>(value))
-                                : static_cast<double>(value);
-}
-
 Json value_at(const parElement& element, int i) {
     switch (element.type) {
         case parElement::typeDouble:
             return static_cast<const double*>(element.pointer)[i];
         case parElement::typeFloat:
-            return plain(static_cast<const float*>(element.pointer)[i]);
+            return as_written(static_cast<const float*>(element.pointer)[i]);
         case parElement::typeInt:
             return static_cast<const std::int32_t*>(element.pointer)[i];
         case parElement::typeString:

@@ -42,12 +42,11 @@ Json complex_value(double real, double imaginary) { return Json::array({real, im
 Json value_of(int type, const char* bytes) {
     switch (type) {
         case 0:
-            return static_cast<double>(taken<float>(bytes));
+            return as_written(taken<float>(bytes));
         case 1:
             return taken<double>(bytes);
         case 2:
-            return complex_value(static_cast<double>(taken<float>(bytes)),
-                                 static_cast<double>(taken<float>(bytes + sizeof(float))));
+            return complex_value(as_written(taken<float>(bytes)), as_written(taken<float>(bytes + sizeof(float))));
         case 3:
             return complex_value(taken<double>(bytes), taken<double>(bytes + sizeof(double)));
         case 4:
