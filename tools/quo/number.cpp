@@ -4,6 +4,16 @@
 #include <cmath>
 
 namespace tool {
+namespace {
+
+std::string with_digits(double value, int digits) {
+    char room[32];
+    const auto [end, error] =
+        std::to_chars(std::begin(room), std::end(room), value, std::chars_format::general, digits);
+    return error == std::errc{} ? std::string{room, end} : exact(value);
+}
+
+}  // namespace
 
 void append_exact(std::string& text, double value) {
     char room[32];  // a sign, 17 digits, a point and an exponent of five characters
@@ -31,12 +41,8 @@ std::string fixed(double value, int decimals) {
     return error == std::errc{} ? std::string{room, end} : exact(value);
 }
 
-std::string rough(double value) {
-    char room[32];
-    const auto [end, error] =
-        std::to_chars(std::begin(room), std::end(room), value, std::chars_format::general, 3);
-    return error == std::errc{} ? std::string{room, end} : exact(value);
-}
+std::string rough(double value) { return with_digits(value, 3); }
+std::string handy(double value) { return with_digits(value, 10); }
 
 std::optional<double> finite_number(std::string_view text) {
     constexpr std::string_view kBlanks = " \t";

@@ -19,6 +19,8 @@ std::string fixed(double value, int decimals);
 
 /** The value with three significant digits, for people. */
 std::string rough(double value);
+/** The value with ten significant digits, for people who compare. */
+std::string handy(double value);
 
 /** The number that the whole text is, blanks around it and a leading plus sign allowed. Nothing for anything else,
  * and for infinity and not-a-number, which no computation here can use. */
