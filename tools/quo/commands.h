@@ -22,6 +22,8 @@ void add_convert(CLI::App& app, Job& job);
 void add_quicklook(CLI::App& app, Job& job);
 void add_footprint(CLI::App& app, Job& job);
 void add_vrt(CLI::App& app, Job& job);
+void add_spectrum(CLI::App& app, Job& job);
+void add_resample(CLI::App& app, Job& job);
 void add_derive(CLI::App& app, Job& job);
 void add_fit(CLI::App& app, Job& job);
 void add_coregister(CLI::App& app, Job& job);

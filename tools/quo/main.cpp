@@ -31,6 +31,8 @@ int run(int argc, char** argv) {
     tool::add_quicklook(app, job);
     tool::add_footprint(app, job);
     tool::add_vrt(app, job);
+    tool::add_spectrum(app, job);
+    tool::add_resample(app, job);
     tool::add_derive(app, job);
     tool::add_fit(app, job);
     tool::add_coregister(app, job);
