@@ -51,7 +51,6 @@ TEST(FieldTable, BringsEveryFieldThroughAHeader) {
         SCOPED_TRACE(books);
         Shelf object, back;
         object.fill(books);
-        object.setExactNumbers(true);
         back.fill(9);
         EXPECT_EQ(object.writehdr(folder.file("header.xml").c_str()), 0);
         EXPECT_EQ(back.readhdr(folder.file("header.xml").c_str()), 0);

@@ -4,7 +4,6 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
-#include <functional>
 #include <string>
 
 #include "header_files.h"
@@ -32,34 +31,25 @@ protected:
     Shelf object_;
 };
 
-/** Writes a product; the same bytes must reach the disk in one save and object by object. */
-void write_product(const std::string& file, Shelf& object) {
-    const std::string shelf = "Shelf", room = "Library/Room-";
-    for (int round = 0; round < 2; ++round) {
-        EXPECT_EQ(object.writeAuxiliaryFile(file.c_str(), 1, "Library"), 0);
-        for (int i = 0; i < 5; ++i)
-            EXPECT_EQ(object.writeAuxiliaryFile(file.c_str(), 1, (room + std::to_string(i)).c_str()), 0);
-        for (const int channel : {1, 2})
-            EXPECT_EQ(object.writeAuxiliaryFile(file.c_str(), channel, shelf.c_str()), 0);
-        object.fill(7 * round);
-    }
-}
-
+// The same bytes must reach the disk in one save and object by object.
 TEST_F(HeaderSessionTest, WritesTheBytesOfObjectByObject) {
-    for (const char* before : {"", "<Other/>", "text"}) {
-        const std::string alone = folder_.file("alone.xml");
-        const std::string text = *before == 't' ? Shelf::text() : before;
+    const auto write_product = [&](const std::string& file) {
+        for (int round = 0; round < 2; ++round) {
+            object_.fill(round == 0 ? 3 : 7);
+            for (const char* section : {"Library", "Library/Room-0", "Library/Room-1", "Shelf"})
+                EXPECT_EQ(write(file, section), 0);
+            EXPECT_EQ(write(file, "Shelf", 2), 0);
+        }
+    };
+    const std::string alone = folder_.file("alone.xml");
+    for (const std::string& text : {std::string{}, std::string{"<Other/>"}, Shelf::text()}) {
         write_text(alone, text);
         write_text(file_, text);
-        object_.fill(3);
-        write_product(alone, object_);
-        object_.fill(3);
-        {
-            HeaderSession session{file_.c_str()};
-            write_product(file_, object_);
-            EXPECT_EQ(read_text(file_), text) << "nothing is saved before the end";
-            EXPECT_EQ(session.commit(), 0);
-        }
+        write_product(alone);
+        HeaderSession session{file_.c_str()};
+        write_product(file_);
+        EXPECT_EQ(read_text(file_), text) << "nothing is saved before the end";
+        EXPECT_EQ(session.commit(), 0);
         EXPECT_EQ(read_text(file_), read_text(alone));
     }
 }
@@ -138,14 +128,10 @@ TEST_F(HeaderSessionTest, NestsForOtherFiles) {
         HeaderSession inner{inner_file.c_str()};
         EXPECT_EQ(HeaderSession::find(file_.c_str()), &outer);
         EXPECT_EQ(HeaderSession::find(inner_file.c_str()), &inner);
-        EXPECT_EQ(write(inner_file, "Inner"), 0);
-        EXPECT_EQ(write(file_, "Outer"), 0);
-        EXPECT_EQ(inner.commit(), 0);
+        EXPECT_EQ(write(inner_file, "Inner") + write(file_, "Outer") + inner.commit(), 0);
     }
-    EXPECT_EQ(HeaderSession::find(inner_file.c_str()), nullptr);
-    EXPECT_EQ(HeaderSession::find(nullptr), nullptr);
-    EXPECT_TRUE(std::filesystem::exists(inner_file));
-    EXPECT_FALSE(std::filesystem::exists(file_));
+    EXPECT_TRUE(!HeaderSession::find(inner_file.c_str()) && !HeaderSession::find(nullptr));
+    EXPECT_TRUE(std::filesystem::exists(inner_file) && !std::filesystem::exists(file_));
     EXPECT_EQ(outer.commit(), 0);
     EXPECT_TRUE(read(file_, "Outer"));
 }

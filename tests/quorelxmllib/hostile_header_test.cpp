@@ -147,18 +147,16 @@ TEST(HostileHeaderFile, SurvivesEveryChangedByte) {
     const std::string file = folder.file("header.xml"), text = Shelf::text();
     int read = 0;
     for (std::size_t place = 0; place < text.size(); ++place) {
-        for (const char byte : {'<', '9', '\xFF'}) {
-            std::string changed = text;
-            changed[place] = byte;
-            write_text(file, changed);
-            Shelf object, again;
-            if (!object.readAuxiliaryFile(file.c_str(), 1, "Shelf") || ++read % 32 != 0) continue;
-            EXPECT_EQ(object.writeAuxiliaryFile(file.c_str(), 1, "Shelf"), 0);
-            EXPECT_TRUE(again.readAuxiliaryFile(file.c_str(), 1, "Shelf"));
-            EXPECT_TRUE(object == again) << place << " " << byte;
-        }
+        std::string changed = text;
+        changed[place] = "<9\xFF"[place % 3];
+        write_text(file, changed);
+        Shelf object, again;
+        if (!object.readAuxiliaryFile(file.c_str(), 1, "Shelf") || ++read % 16 != 0) continue;
+        EXPECT_EQ(object.writeAuxiliaryFile(file.c_str(), 1, "Shelf"), 0);
+        EXPECT_TRUE(again.readAuxiliaryFile(file.c_str(), 1, "Shelf"));
+        EXPECT_TRUE(object == again) << place;
     }
-    EXPECT_GT(read, 100);
+    EXPECT_GT(read, 50);
 }
 
 // A length costs nothing but its digits; the file has to be long enough for what it promises.

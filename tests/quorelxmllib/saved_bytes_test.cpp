@@ -80,25 +80,24 @@ constexpr Edit kEdits[] = {{"Nothing", nothing},
                            {"TextForArray", replace_array_by_text},
                            {"Removal", remove_section}};
 
-constexpr const char* kOrigins[] = {
-    "",
-    "    <Sec>\n      <one>1</one>\n    </Sec>\n",
-    "<Sec><one>1</one><Arr><val N=\"1\">4</val></Arr></Sec><Only/>",
-    "\n\n\t\t<Sec>\n\n\n<one> 1 </one>\n</Sec>   \n<Blank>   </Blank>",
-    "<Mixed>text <b>x</b>  <i> </i> tail</Mixed><Mixed> <b/>text</Mixed>",
-    "<!-- a --><Sec><!-- b\n  b --><one/><?p i?></Sec>  <!-- c -->",
-    "<Sec><![CDATA[ <x> ]]></Sec><Sec><![CDATA[]]></Sec><Only><![CDATA[  ]]></Only>",
-    "<Sec xml:space=\"preserve\">  <one/>  </Sec>",
-    "<List>1, 2, 3</List><Blank>&#32;</Blank>",
-    "<Sec>&amp;&#65;&lt;&#xE8;&#13;</Sec><Only a=\"&#10;&quot;\"/>",
-    "<x:Sec xmlns:x=\"urn:x\"><x:one/></x:Sec><Sec xmlns=\"urn:y\"><one/></Sec>",
-};
-
 /** Content of an element: blanks, texts, comments, elements that the edits know and others, in any order. */
 std::string random_content(std::mt19937& random, int depth) {
-    constexpr const char* kLeaves[] = {
-        " ",     "\n  ",      "text",  " 1, 2 ", "<!-- c -->", "<?p i?>", "<![CDATA[ x ]]>", "<![CDATA[]]>",
-        "&#32;", "&lt;&amp;", "&#13;", "<e/>",   "<e></e>",    "<e> </e>"};
+    constexpr const char* kLeaves[] = {" ",
+                                       "\n  ",
+                                       "text",
+                                       " 1, 2 ",
+                                       "<!-- c -->",
+                                       "<?p i?>",
+                                       "<![CDATA[ x ]]>",
+                                       "<![CDATA[]]>",
+                                       "&#32;",
+                                       "&lt;&amp;",
+                                       "&#13;",
+                                       "<e/>",
+                                       "<e></e>",
+                                       "<e> </e>",
+                                       "&#xE8;<Only a=\"&#10;&quot;\"/>",
+                                       "<Only xmlns=\"urn:y\"> </Only>"};
     constexpr const char* kNames[] = {"Sec", "Arr", "one", "texts", "Blank", "List", "b"};
     std::string content;
     for (auto pieces = random() % 5; pieces > 0; --pieces) {
@@ -133,10 +132,9 @@ void expect_saved_as_if_twice(const std::string& inside, const Edit& edit) {
 }
 
 TEST(SavedBytes, AreThoseOfSavingTwice) {
-    for (const char* origin : kOrigins)
-        for (const Edit& edit : kEdits) expect_saved_as_if_twice(origin, edit);
+    for (const Edit& edit : kEdits) expect_saved_as_if_twice("", edit);
     std::mt19937 random{20120717};
-    for (int round = 0; round < 150 && !testing::Test::HasFailure(); ++round) {
+    for (int round = 0; round < 250 && !testing::Test::HasFailure(); ++round) {
         const std::string inside = random_content(random, 5);
         expect_saved_as_if_twice(inside, kEdits[random() % std::size(kEdits)]);
     }

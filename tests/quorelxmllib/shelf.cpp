@@ -1,11 +1,8 @@
 #include "shelf.h"
 
-#include <algorithm>
-#include <cstdio>
-#include <cstring>
-
 #include "header_files.h"
 #include "quorelxmllib/field_table.h"
+#include "support/fields.h"
 
 namespace test {
 namespace {
@@ -25,11 +22,6 @@ constexpr quo::FieldTable kTable{
     QUO_FIELD(weights, QUO_LENGTH(nBooks), quo::kOptional),
 };
 
-template <typename T>
-bool same(const T* a, const T* b, std::size_t count) {
-    return (a == nullptr) == (b == nullptr) && (!a || std::memcmp(a, b, count * sizeof(T)) == 0);
-}
-
 }  // namespace
 
 Shelf::Shelf() { createElementsVector(kTable.size()); }
@@ -44,29 +36,13 @@ int Shelf::readhdr(const char* file) {
 }
 
 void Shelf::fill(int books) {
-    width = 1.0 / 3.0;
-    height = 0.7F;
-    boards = 17;
-    std::snprintf(label, sizeof label, "Poems & <plays>, %d", books);
-    std::snprintf(code, sizeof code, "P-%d", books);
-    for (int i = 0; i < 4; ++i) corners[i] = 803.5 * i - 1e-7;
     nBooks = books;
     createBuffers();
-    for (int i = 0; i < 3 * books; ++i) pages[static_cast<std::size_t>(i)] = 100.25 + i;
-    for (int i = 0; i < books; ++i) {
-        shape[static_cast<std::size_t>(i)] = 40 - i;
-        weights[i] = 0.5F * static_cast<float>(i) + 0.125F;
-    }
+    fill_fields(*this);
+    nBooks = books;
 }
 
-bool Shelf::operator==(const Shelf& other) const {
-    const auto books = static_cast<std::size_t>(std::max(nBooks, 0));
-    return same(&width, &other.width, 1) && same(&height, &other.height, 1) && boards == other.boards &&
-           std::string{label} == other.label && std::string{code} == other.code &&
-           same(corners, other.corners, 4) && nBooks == other.nBooks &&
-           same(pages.get(), other.pages.get(), 3 * books) && shape == other.shape &&
-           same(weights, other.weights, books);
-}
+bool Shelf::operator==(const Shelf& other) const { return differing_fields(*this, other).empty(); }
 
 std::string Shelf::text() {
     return header_text(R"(    <Shelf>

@@ -20,9 +20,9 @@ public:
     int readhdr(const char* file) override;
     int writehdr(const char* file) override;
     int clone(Shelf* to) const;
-    /** Gives every field a value of its own, and the arrays this length. */
+    /** Gives every field a value of its own, which 15 digits hold, and the arrays this length. */
     void fill(int books);
-    /** Whether every field is the same, bit by bit. */
+    /** Whether every field holds the same. */
     bool operator==(const Shelf& other) const;
     /** A header file with a shelf of two books. */
     static std::string text();
