@@ -95,11 +95,11 @@ TEST(ScanList, ReadsListsOfAnyLength) {
 }
 
 TEST(ScanList, TakesNumbersOfAnyLength) {
-    for (const std::size_t digits : {200U, 511U, 512U, 5000U}) {
-        double values[2] = {-17.3, -17.3};
+    for (const std::size_t digits : {511U, 512U, 5000U}) {
+        double value = -17.3;
         const std::string text = "0." + std::string(digits, '1') + "e" + std::string(digits, '0') + "1, 2.5";
-        EXPECT_GE(scan_list(text.c_str(), values, 2), 1);
-        EXPECT_NEAR(values[0], digits == 200 ? 1.0 / 0.9 : 1.0 / 9.0, 1e-15) << digits;
+        EXPECT_EQ(scan_list(text.c_str(), &value, 1), 1);
+        EXPECT_NEAR(value, 1.0 / 9.0, 1e-15) << digits;
     }
 }
 
