@@ -105,47 +105,39 @@ TEST_P(Headings, CountsTheTenthOfAMillisecondBeyondTheEnds) {
 
 // The guess's steps as they are written down: the along-track frame of the whole orbit's mean velocity, the run in
 // whose middle the point lies, and the same again in that run's frame.
-double along_track_time(const double from[3], const double to[3], double flight_s, const Vec3& d, double fd,
-                        double lambda, double* range_s) {
-    double v[3], R[9], V = 0.0;
-    for (int i = 0; i < 3; ++i) v[i] = (to[i] - from[i]) / flight_s;
-    EXPECT_EQ(GeneralSAROrbit::computeRotationMatrix(v, R, &V), 0);
-    const double a = R[0] * d[0] + R[3] * d[1] + R[6] * d[2], b = R[1] * d[0] + R[4] * d[1] + R[7] * d[2];
-    const double c = R[2] * d[0] + R[5] * d[1] + R[8] * d[2];
-    double tau = a / V;
-    if (fd != 0.0) {
-        const double k = std::pow(fd * lambda / 2.0, 2.0) / (V * V), B = (k - 1.0) * a, r2 = a * a + b * b + c * c;
-        tau = (std::sqrt(B * B - (a * a - k * r2) * (1.0 - k)) - B) / (1.0 - k) / V;
-    }
-    *range_s = 2.0 * std::sqrt(std::pow(a - tau * V, 2.0) + b * b + c * c) / test::kLightSpeed;
-    return tau;
-}
 TEST_P(Headings, GuessesByItsSteps) {
     GeneralSAROrbit orbit;
     test::make_orbit(orbit, kTimes, [&](double t) { return state(kTimes, t); });
-    const auto position = [&](int i) { return orbit.pSV_m + 3 * static_cast<std::size_t>(i); };
-    for (const double t_seen : {-40.0, 0.0, 3.1, 21.7, 77.7, 140.1, 153.9, 260.0}) {
-        const Vec3 target = target_beside(state(kTimes, kTimes.first_s + t_seen), 331e3);
+    const auto vector = [&](int i) {
+        const double* p = orbit.pSV_m + 3 * static_cast<std::size_t>(i);
+        return Vec3{p[0], p[1], p[2]};
+    };
+    for (const double t_seen : {-40.0, 0.0, 3.1, 21.7, 77.7, 140.1, 153.9, 260.0})
         for (const double fd : {0.0, 812.5, -812.5}) {
+            const Vec3 target = target_beside(state(kTimes, kTimes.first_s + t_seen), 331e3);
             double range = 0.0, t = 0.0, tau = 0.0;
-            const auto line_from = [&](int i) {
-                return target - Vec3{position(i)[0], position(i)[1], position(i)[2]};
+            const auto along_track_time = [&](int from, int to) {
+                const Vec3 v = 1.0 / ((to - from) * kTimes.spacing_s) * (vector(to) - vector(from));
+                const Vec3 d = target - vector(from);
+                double R[9], V = 0.0;
+                EXPECT_EQ(GeneralSAROrbit::computeRotationMatrix(v.v, R, &V), 0);
+                const double a = R[0] * d[0] + R[3] * d[1] + R[6] * d[2], r2 = test::dot(d, d);
+                const double k = std::pow(fd * orbit.getLambda() / 2.0, 2.0) / (V * V), B = (k - 1.0) * a;
+                const double root = std::sqrt(B * B - (a * a - k * r2) * (1.0 - k));
+                const double time = fd == 0.0 ? a / V : (root - B) / (1.0 - k) / V;
+                range = 2.0 * std::sqrt(std::pow(a - time * V, 2.0) + r2 - a * a) / test::kLightSpeed;
+                return time;
             };
-            const double first = along_track_time(position(0), position(16), 16 * kTimes.spacing_s, line_from(0),
-                                                  fd, orbit.getLambda(), &range);
-            const int m = static_cast<int>(std::clamp(std::round(first / kTimes.spacing_s) - 2.0, 0.0, 12.0));
-            const double second = along_track_time(position(m), position(m + 4), 4 * kTimes.spacing_s,
-                                                   line_from(m), fd, orbit.getLambda(), &range);
+            const double middle = std::round(along_track_time(0, 16) / kTimes.spacing_s) - 2.0;
+            const int m = static_cast<int>(std::clamp(middle, 0.0, 12.0));
+            const double expected = kTimes.at(m) + along_track_time(m, m + 4);
             EXPECT_EQ(orbit.earth2satLinear(target.v, &t, &tau, fd), 0);
-            EXPECT_NEAR(t, kTimes.at(m) + second, 1e-8);
+            EXPECT_NEAR(t, expected, 1e-8);
             EXPECT_NEAR(tau, range, 1e-14);
-            if (fd == 0.0) {
-                const double with_doppler = t;
-                EXPECT_EQ(orbit.earth2satLinear(target.v, &t, &tau), 0);
-                EXPECT_EQ(t, with_doppler);
-            }
+            const double with_doppler = t;
+            EXPECT_EQ(orbit.earth2satLinear(target.v, &t, &tau), 0);
+            EXPECT_EQ(t == with_doppler, fd == 0.0);
         }
-    }
 }
 
 // Over a revolution and a half the mean velocity says nothing, and points are abeam of several passes: a near one
