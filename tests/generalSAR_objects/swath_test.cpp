@@ -12,6 +12,7 @@
 #include "quo_base/gen_utils.h"
 #include "support/diagnostics.h"
 #include "support/fields.h"
+#include "support/full_disk.h"
 #include "support/raster.h"
 
 namespace {
@@ -307,6 +308,12 @@ TEST_F(Pattern, RefusesWhatIsNoPattern) {
     EXPECT_EQ(nameless.readhdr(".hdr"), 1);
 
     make_pattern(complex);
+    {
+        const test::FullDisk full{5};
+        EXPECT_EQ(complex.WritePatternArray(), 5);
+        EXPECT_EQ(complex.writehdr(), 1);
+    }
+    std::filesystem::remove(name_);
     complex.Pattern.clear();
     complex.PatternFile.CellType = FLOAT_COMPLEX;
     EXPECT_THAT(samples(complex, 1), Each(803.5F));
