@@ -2,6 +2,7 @@
 
 #include <cmath>
 
+#include "orbit/made_orbits.h"
 #include "support/geometry.h"
 #include "support/scenes.h"
 
@@ -46,7 +47,7 @@ struct Closure {
 /** Samples all over the extent of the scene, times on whole microseconds, either look side, three Dopplers. */
 void expect_closed(GeneralSAROrbit& orbit, const test::Extent& extent, double doppler_hz, const Closure& within) {
     constexpr int kSteps = 23;
-    for (const int side : {+1, -1}) {
+    for (const int side : {+5, 0, -1}) {  // not negative: right
         orbit.setLookSign(side);
         for (const double doppler : {0.0, doppler_hz, -doppler_hz}) {
             for (int i = 0; i <= kSteps * kSteps; ++i) {
@@ -63,6 +64,9 @@ void expect_closed(GeneralSAROrbit& orbit, const test::Extent& extent, double do
                 ASSERT_EQ(orbit.sat2earth(t_back, range_back, doppler, again.v), 0);
                 EXPECT_LT(test::norm(again - p), within.point_m);
                 EXPECT_NEAR(test::height_above_ellipsoid(p), 0.0, 1e-5);
+                const Vec3 from = test::position_at(orbit, t);
+                const Vec3 right = test::cross(test::velocity_at(orbit, t), from);
+                EXPECT_EQ(test::dot(right, p - from) > 0.0, side >= 0);
             }
         }
     }

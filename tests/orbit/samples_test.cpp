@@ -107,22 +107,6 @@ TEST_P(SceneSamples, FmRateIsTheDerivativeOfTheDoppler) {
     }
 }
 
-TEST_P(SceneSamples, PointsMeetRangeDopplerEllipsoidAndSide) {
-    for (const int side : {GetParam().geocentric ? 5 : -5, 0, -1}) {
-        orbit_.setLookSign(side);
-        for (const double doppler : {0.0, GetParam().doppler_hz, -GetParam().doppler_hz}) {
-            for_samples(doppler, [&](const Sample& s) {
-                const Vec3 line = s.point - s.platform;
-                EXPECT_NEAR(test::norm(line), 0.5 * test::kLightSpeed * s.range_s, 1e-5);
-                EXPECT_NEAR(2.0 / orbit_.getLambda() * test::dot(s.velocity, line) / test::norm(line), doppler,
-                            1e-5);
-                EXPECT_NEAR(test::height_above_ellipsoid(s.point), 0.0, 1e-5);
-                EXPECT_GT((side < 0 ? -1.0 : 1.0) * test::dot(test::cross(s.velocity, s.platform), line), 0.0);
-            });
-        }
-    }
-}
-
 TEST_P(SceneSamples, SquintedLinesLeaveAtTheirAngleAndEndOnTheGround) {
     for (const double squint : {0.0, 3.7, -11.3}) {
         for_samples(0.0, [&](const Sample& s) {

@@ -186,39 +186,8 @@ TEST_F(Registry, WritesItsSectionOnceAndKeepsTheOthers) {
     EXPECT_EQ(read_text(file_), header_text(others + "    <S>\n      <n>0</n>\n" + end));
 }
 
-TEST_F(Registry, ReadsSinglesThenAllocatesThenEverything) {
-    std::int32_t n = -1, late = -1;
-    double array[5] = {-1, -1, -1, -1, -1};
-    char text[512] = "default";
-    Free object;
-    int length = 0;
-    object.registration = [&](Free& self) {
-        self.addElementDouble("array", array, length, 0, 0, true);
-        self.addElementInt("n", &n, 1, 0, 0, true);
-        self.addElementString("text", text, true);
-        self.addElementInt("late", &late, 1, 0, 0, false);
-    };
-    object.createElementsVector(4);
-    object.allocation = [&](Free& self) {
-        EXPECT_EQ(n, 5);
-        EXPECT_EQ(late, 9);
-        EXPECT_STREQ(text, "default") << "texts come with the second pass";
-        n = late = 0;  // read again in the second pass
-        length = 5;
-        self.registration(self);
-        return 0;
-    };
-    const std::string inside =
-        "<n>5</n><late>9</late><text>read</text><array><val>1</val><val>2</val><val>3</val><val>4</val><val>5</"
-        "val></array>";
-    EXPECT_TRUE(object.readAuxiliaryFile(file(inside).c_str(), 1, "S"));
-    EXPECT_THAT(array, ElementsAre(1, 2, 3, 4, 5));
-    EXPECT_EQ(n, 5);
-    EXPECT_EQ(late, 9);
-    EXPECT_STREQ(text, "read");
-}
-
-// Which elements may be missing is tested with the classes that have them.
+// Which elements may be missing is tested with the classes that have them, lengths that follow their arrays with
+// the shelf.
 TEST_F(Registry, FailsWhenTheBuffersCannotBeHad) {
     const test::CapturedStderr quiet;
     std::int32_t i = 0;

@@ -53,21 +53,6 @@ struct View {
     }
 };
 
-// The slow search decides near the nadir; everywhere else it has to come to the same place as the fast one.
-TEST(GroundPoint, IsTheSameBySearch) {
-    for (const double side : {+1.0, -1.0})
-        for (const double fd : {0.0, 7217.6})
-            for (const double range : {715e3, 803457.3, 1948730.1, 2800e3}) {
-                const View view{range, fd, side};
-                quo::LookCircle circle;
-                quo::CirclePoint at;
-                ASSERT_EQ(quo::make_look_circle(view.S, view.V, view.look, quo::kWgs84, &circle), 0);
-                ASSERT_TRUE(quo::search_crossing(circle, &at));
-                const Vec3 p = view.S + (circle.along + at.c * circle.down + at.s * circle.across);
-                EXPECT_LT(quo::norm(p - view.P), 1e-6) << range << " " << fd << " " << side;
-            }
-}
-
 // The last rate is that of a body turning ten times as fast as the Earth.
 TEST(RefineGroundPoint, FindsTheSolutionFromAfar) {
     for (const double omega : {0.0, test::kEarthRate, 10.0 * test::kEarthRate}) {
