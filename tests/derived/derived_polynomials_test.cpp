@@ -32,7 +32,7 @@ struct Place {
 enum Quantity { kRate, kIncidence, kLook, kGround, kSlant, kQuantities };
 constexpr const char* kUnits[kQuantities] = {"FM rate Hz/s", "incidence deg", "look deg", "ground m", "slant m"};
 
-/** All derived polynomials of a region, in range alone or in both times. */
+/** All derived polynomials of a region. */
 struct Derived {
     polyFR rate;
     polySL2THETA theta;
@@ -40,24 +40,95 @@ struct Derived {
     polySL2GR ground;
     polyGR2SL slant;
 
-    void range_forms(GeneralSAROrbit& orbit, const ROI_Obj& roi, const polyDC& dc) {
-        ASSERT_EQ(orbit.SVGetFRpoly(&roi, &dc, &rate), 0);
-        ASSERT_EQ(orbit.SVGetSlantToAnglesPolys(&roi, &dc, &theta, &phi), 0);
-        ASSERT_EQ(orbit.SVGetGroundToSlantPolys(&roi, &dc, &ground, &slant), 0);
-    }
-    void grid_forms(GeneralSAROrbit& orbit, const ROI_Obj& roi, const polyDC& dc) {
-        ASSERT_EQ(orbit.SVGetFRpoly_v2(&roi, &dc, &rate), 0);
-        ASSERT_EQ(orbit.SVGetTimeToAnglesPolys(&roi, &dc, &theta, &phi), 0);
-        ASSERT_EQ(orbit.SVGetGroundToTimePolys(&roi, &dc, &ground, &slant), 0);
+    [[nodiscard]] std::array<const poly*, kQuantities> all() const {
+        return {&rate, &theta, &phi, &ground, &slant};
     }
     [[nodiscard]] std::array<double, kQuantities> at(const Place& place) const {
         std::array<double, kQuantities> values{};
-        rate.EvaluatePoly(place.range_s, place.azimuth_s, &values[kRate]);
-        theta.EvaluatePoly(place.range_s, place.azimuth_s, &values[kIncidence]);
-        phi.EvaluatePoly(place.range_s, place.azimuth_s, &values[kLook]);
-        ground.EvaluatePoly(place.range_s, place.azimuth_s, &values[kGround]);
+        for (std::size_t q = 0; q < kSlant; ++q)
+            all()[q]->EvaluatePoly(place.range_s, place.azimuth_s, &values[q]);
         slant.EvaluatePoly(slant.trg0 + place.ground_m, place.azimuth_s, &values[kSlant]);
         values[kSlant] *= 0.5 * test::kLightSpeed;
+        return values;
+    }
+};
+
+/** One of the six operations, on polynomials of its own. */
+struct Operation {
+    const char* name;
+    bool fine, in_both_times;
+    int (*run)(GeneralSAROrbit&, const ROI_Obj*, const polyDC*, Derived&);
+};
+void PrintTo(const Operation& operation, std::ostream* out) { *out << operation.name; }
+const Operation kOperations[] = {
+    {"SVGetFRpoly", false, false,
+     [](auto& o, auto* roi, auto* dc, Derived& d) { return o.SVGetFRpoly(roi, dc, &d.rate); }},
+    {"SVGetFRpoly_v2", true, false,
+     [](auto& o, auto* roi, auto* dc, Derived& d) { return o.SVGetFRpoly_v2(roi, dc, &d.rate); }},
+    {"SVGetSlantToAnglesPolys", false, false,
+     [](auto& o, auto* roi, auto* dc, Derived& d) {
+         return o.SVGetSlantToAnglesPolys(roi, dc, &d.theta, &d.phi);
+     }},
+    {"SVGetTimeToAnglesPolys", true, true,
+     [](auto& o, auto* roi, auto* dc, Derived& d) { return o.SVGetTimeToAnglesPolys(roi, dc, &d.theta, &d.phi); }},
+    {"SVGetGroundToSlantPolys", false, false,
+     [](auto& o, auto* roi, auto* dc, Derived& d) {
+         return o.SVGetGroundToSlantPolys(roi, dc, &d.ground, &d.slant);
+     }},
+    {"SVGetGroundToTimePolys", true, true,
+     [](auto& o, auto* roi, auto* dc, Derived& d) {
+         return o.SVGetGroundToTimePolys(roi, dc, &d.ground, &d.slant);
+     }},
+};
+
+/** A real scene, its region and a Doppler, 0 at first. */
+struct Product {
+    GeneralSAROrbit orbit;
+    ROI_Obj roi;
+    polyDC dc;
+    explicit Product(const test::Scene& scene) {
+        test::load_orbit(scene, orbit);
+        if (roi.read_roi(scene.path(".xml").c_str(), "ROI")) throw std::runtime_error{"no region"};
+        dc.trg0 = roi.FastStartTime;
+        dc.taz0 = roi.SlowStartTime;
+    }
+    [[nodiscard]] double azimuth(double share) const { return roi.SlowStartTime + share * roi.SlowTimeLength; }
+    [[nodiscard]] double range(double share) const { return roi.FastStartTime + share * roi.FastTimeLength; }
+    [[nodiscard]] double doppler(double azimuth_s, double range_s) const {
+        double value_hz = 0.0;
+        dc.EvaluatePoly(range_s, azimuth_s, &value_hz);
+        return value_hz;
+    }
+    /** The forms in range alone, or the finer ones. */
+    void derive(Derived& derived, bool fine) {
+        for (const Operation& operation : kOperations) {
+            EXPECT_TRUE(operation.fine != fine || operation.run(orbit, &roi, &dc, derived) == 0) << operation.name;
+        }
+    }
+    /** The ground points of steps from the start to a share of the range times, as the sum of their chords. */
+    double ground_range(double azimuth_s, double share, int steps) {
+        test::Vec3 before{}, point{};
+        double sum_m = 0.0;
+        for (int i = 0; i <= steps; ++i) {
+            const double range_s = range(share * i / std::max(steps, 1));
+            EXPECT_EQ(orbit.sat2earth(azimuth_s, range_s, doppler(azimuth_s, range_s), point.v), 0);
+            if (i > 0) sum_m += norm(point - before);
+            before = point;
+        }
+        return sum_m;
+    }
+    /** A place, its ground range in so many chords, and the geometry there. */
+    Place place(double along, double across, int steps) {
+        const double azimuth_s = azimuth(along), range_s = range(across);
+        return {azimuth_s, range_s, doppler(azimuth_s, range_s), ground_range(azimuth_s, across, steps)};
+    }
+    std::array<double, kQuantities> truth(const Place& at) {
+        std::array<double, kQuantities> values{};
+        EXPECT_EQ(orbit.SVGetFR(at.azimuth_s, at.range_s, at.doppler_hz, &values[kRate]), 0);
+        EXPECT_EQ(orbit.SVGetAngles(at.azimuth_s, at.range_s, at.doppler_hz, &values[kIncidence], &values[kLook]),
+                  0);
+        values[kGround] = at.ground_m;
+        values[kSlant] = 0.5 * test::kLightSpeed * (at.range_s - roi.FastStartTime);
         return values;
     }
 };
@@ -82,78 +153,77 @@ constexpr double kRateDefect = 1e-8;
 
 class DerivedPolynomials : public testing::TestWithParam<Region> {
 protected:
-    DerivedPolynomials() {
-        const test::Scene& scene = test::kScenes[GetParam().scene];
-        test::load_orbit(scene, orbit_);
-        if (roi_.read_roi(scene.path(".xml").c_str(), "ROI")) throw std::runtime_error{"no region"};
-        dc_.trg0 = roi_.FastStartTime;
-        dc_.taz0 = roi_.SlowStartTime;
-    }
+    DerivedPolynomials() : product_{test::kScenes[GetParam().scene]} {}
 
-    /** Ground range by many short chords. */
-    double ground_range(double azimuth_s, double range_s) {
-        constexpr int kChords = 400;
-        test::Vec3 before{}, point{};
-        double sum_m = 0.0;
-        for (int i = 0; i <= kChords; ++i) {
-            const double r = roi_.FastStartTime + (range_s - roi_.FastStartTime) * i / kChords;
-            EXPECT_EQ(orbit_.sat2earth(azimuth_s, r, doppler(azimuth_s, r), point.v), 0);
-            if (i > 0) sum_m += norm(point - before);
-            before = point;
-        }
-        return sum_m;
-    }
-    double doppler(double azimuth_s, double range_s) const {
-        double value_hz = 0.0;
-        dc_.EvaluatePoly(range_s, azimuth_s, &value_hz);
-        return value_hz;
-    }
-    std::array<double, kQuantities> truth(const Place& place) {
-        std::array<double, kQuantities> values{};
-        EXPECT_EQ(orbit_.SVGetFR(place.azimuth_s, place.range_s, place.doppler_hz, &values[kRate]), 0);
-        EXPECT_EQ(orbit_.SVGetAngles(place.azimuth_s, place.range_s, place.doppler_hz, &values[kIncidence],
-                                     &values[kLook]),
-                  0);
-        values[kGround] = place.ground_m;
-        values[kSlant] = 0.5 * test::kLightSpeed * (place.range_s - roi_.FastStartTime);
-        return values;
-    }
     /** Largest differences at places between the samples, at azimuth times `from` to `to` of the region. */
     std::array<double, kQuantities> residuals(const Derived& derived, double from, double to) {
         std::array<double, kQuantities> largest{};
         for (const double along : {from, from + 0.31 * (to - from), from + 0.77 * (to - from), to}) {
             for (int i = 0; i <= 16; ++i) {
-                const double azimuth_s = roi_.SlowStartTime + along * roi_.SlowTimeLength;
-                const double range_s = roi_.FastStartTime + i / 16.0 * roi_.FastTimeLength;
-                const Place place{azimuth_s, range_s, doppler(azimuth_s, range_s),
-                                  ground_range(azimuth_s, range_s)};
-                const auto fitted = derived.at(place), direct = truth(place);
+                const Place place = product_.place(along, i / 16.0, 400);
+                const auto fitted = derived.at(place), direct = product_.truth(place);
                 for (int q = 0; q < kQuantities; ++q)
                     largest[q] = std::max(largest[q], std::abs(fitted[q] - direct[q]));
             }
         }
         return largest;
     }
-    void expect_below(const char* form, const std::array<double, kQuantities>& largest,
-                      const double (&bounds)[kQuantities]) {
+    static void expect_below(const char* form, const std::array<double, kQuantities>& largest,
+                             const double (&bounds)[kQuantities]) {
         for (int q = 0; q < kQuantities; ++q) {
             std::printf("%-18s %-10s %-14s %10.3g (bound %g)\n", GetParam().name, form, kUnits[q], largest[q],
                         bounds[q]);
             EXPECT_LT(largest[q], bounds[q]) << form << ", " << kUnits[q];
         }
     }
+    /** How far the residuals at the very samples are from orthogonal to the terms of a fit, which a least-squares
+     * fit makes them: the largest sum of residuals times a term, relative to that of the values. */
+    double defect(const Derived& derived, int quantity, int ranges, int azimuths) {
+        std::array<double, 7> sums{}, scales{};
+        for (int j = 0; j < azimuths; ++j) {
+            const double v = azimuths > 1 ? j / (azimuths - 1.0) : 0.5;
+            double ground_m = 0.0;
+            for (int i = 0; i < ranges; ++i) {
+                const double u = i / (ranges - 1.0);
+                Place place = product_.place(v, u, 0);
+                if (i > 0) ground_m += chord(place.azimuth_s, (i - 1) / (ranges - 1.0), u);
+                place.ground_m = ground_m;
+                const auto q = static_cast<std::size_t>(quantity);
+                const double direct = product_.truth(place)[q], rest = derived.at(place)[q] - direct;
+                // A parabola over ground range is orthogonal to powers of the ground range.
+                const double w = quantity == kSlant ? ground_m / 1e5 : u, more = azimuths > 1 ? 1.0 : 0.0;
+                const double terms[] = {
+                    1.0, w, w * w, more * v, more * w * v, more * w * w * w, more * w * w * w * w};
+                for (std::size_t k = 0; k < 7; ++k) {
+                    sums[k] += rest * terms[k];
+                    scales[k] += std::abs(direct * terms[k]);
+                }
+            }
+        }
+        double largest = 0.0;
+        for (std::size_t k = 0; k < (azimuths > 1 ? 7U : 3U); ++k)
+            largest = std::max(largest, std::abs(sums[k]) / scales[k]);
+        return largest;
+    }
+    double chord(double azimuth_s, double from, double to) {
+        test::Vec3 a{}, b{};
+        const double near_s = product_.range(from), far_s = product_.range(to);
+        EXPECT_EQ(product_.orbit.sat2earth(azimuth_s, near_s, product_.doppler(azimuth_s, near_s), a.v), 0);
+        EXPECT_EQ(product_.orbit.sat2earth(azimuth_s, far_s, product_.doppler(azimuth_s, far_s), b.v), 0);
+        return norm(b - a);
+    }
 
-    GeneralSAROrbit orbit_;
-    ROI_Obj roi_;
-    polyDC dc_;
+    Product product_;
+    polyDC& dc_ = product_.dc;
+    const ROI_Obj& roi_ = product_.roi;
 };
 INSTANTIATE_TEST_SUITE_P(Scenes, DerivedPolynomials, testing::ValuesIn(kRegions),
                          [](const auto& row) { return row.param.name; });
 
 TEST_P(DerivedPolynomials, StayWithinTheirBounds) {
     Derived parabolas, grids;
-    parabolas.range_forms(orbit_, roi_, dc_);
-    grids.grid_forms(orbit_, roi_, dc_);
+    product_.derive(parabolas, false);
+    product_.derive(grids, true);
     expect_below("parabola", residuals(parabolas, 0.5, 0.5), GetParam().parabolas);
     // The rate of the second form has no azimuth term either.
     auto largest = residuals(grids, 0.0, 1.0);
@@ -161,31 +231,8 @@ TEST_P(DerivedPolynomials, StayWithinTheirBounds) {
     expect_below("grid", largest, GetParam().grids);
 }
 
-/** Sums of residuals times basis functions, which a least-squares fit makes vanish, against the sums of their
- * magnitudes. */
-template <std::size_t Terms>
-class NormalEquations {
-public:
-    void add(double residual, double magnitude, const std::array<double, Terms>& terms) {
-        for (std::size_t k = 0; k < Terms; ++k) {
-            sums_[k] += residual * terms[k];
-            scales_[k] += std::abs(magnitude * terms[k]);
-        }
-    }
-    /** The largest of the sums, relative to the values that were fitted. */
-    [[nodiscard]] double defect() const {
-        double largest = 0.0;
-        for (std::size_t k = 0; k < Terms; ++k) largest = std::max(largest, std::abs(sums_[k]) / scales_[k]);
-        return largest;
-    }
-
-private:
-    std::array<double, Terms> sums_{}, scales_{};
-};
-
-// What defines the fits, with other sums than theirs: the residuals at the very samples are orthogonal to every
-// term. A step too many or too few, a wrong Doppler or azimuth time, lost digits or a mixed-up coefficient breaks
-// it.
+// What defines the fits, with other sums than theirs. A step too many or too few, a wrong Doppler or azimuth time,
+// lost digits or a mixed-up coefficient breaks it.
 TEST_P(DerivedPolynomials, LeaveResidualsOrthogonalToTheirTerms) {
     const double doppler_hz = test::kScenes[GetParam().scene].doppler_hz;
     const double slopes[7] = {0.3 * doppler_hz, 0.4 * doppler_hz / roi_.FastTimeLength,
@@ -193,98 +240,51 @@ TEST_P(DerivedPolynomials, LeaveResidualsOrthogonalToTheirTerms) {
     std::ranges::copy(slopes, dc_.pol);
     dc_.trg0 += 0.37 * roi_.FastTimeLength;
     Derived parabolas, grids;
-    parabolas.range_forms(orbit_, roi_, dc_);
-    grids.grid_forms(orbit_, roi_, dc_);
-
-    const auto check = [&](const Derived& derived, int ranges, int azimuths, double first_line) {
-        std::array<NormalEquations<7>, kQuantities> sums;
-        for (int j = 0; j < azimuths; ++j) {
-            const double v = azimuths > 1 ? j / (azimuths - 1.0) : first_line;
-            const double azimuth_s = roi_.SlowStartTime + v * roi_.SlowTimeLength;
-            test::Vec3 before{};
-            double ground_m = 0.0;
-            for (int i = 0; i < ranges; ++i) {
-                const double u = i / (ranges - 1.0), range_s = roi_.FastStartTime + u * roi_.FastTimeLength;
-                const double hz = doppler(azimuth_s, range_s);
-                test::Vec3 point{};
-                ASSERT_EQ(orbit_.sat2earth(azimuth_s, range_s, hz, point.v), 0);
-                if (i > 0) ground_m += norm(point - before);
-                before = point;
-                const Place place{azimuth_s, range_s, hz, ground_m};
-                const auto fitted = derived.at(place), direct = truth(place);
-                // A parabola over ground range is orthogonal to powers of the ground range.
-                for (int q = 0; q < kQuantities; ++q) {
-                    const double w = q == kSlant ? ground_m / 1e5 : u;
-                    const bool grid = azimuths > 1;
-                    const std::array<double, 7> terms{1.0,
-                                                      w,
-                                                      w * w,
-                                                      grid ? v : 1.0,
-                                                      grid ? w * v : 1.0,
-                                                      grid ? w * w * w : 1.0,
-                                                      grid ? w * w * w * w : 1.0};
-                    sums[q].add(fitted[q] - direct[q], direct[q], terms);
-                }
-            }
-        }
-        for (int q = 0; q < kQuantities; ++q) {
-            if (azimuths > 1 && (q == kRate || q == kSlant)) continue;  // no azimuth terms; other samples
-            EXPECT_LT(sums[q].defect(), q == kRate ? kRateDefect : 1e-10) << kUnits[q];
-        }
-    };
-    check(parabolas, 10, 1, 0.5);
-    check(grids, 100, 50, 0.0);
-
-    NormalEquations<3> fine_rate;
-    for (int i = 0; i < 50; ++i) {
-        const double u = i / 49.0, range_s = roi_.FastStartTime + u * roi_.FastTimeLength;
-        const double azimuth_s = roi_.SlowStartTime + 0.5 * roi_.SlowTimeLength;
-        double direct = 0.0, fitted = 0.0;
-        ASSERT_EQ(orbit_.SVGetFR(azimuth_s, range_s, doppler(azimuth_s, range_s), &direct), 0);
-        grids.rate.EvaluatePoly(range_s, -1e9, &fitted);
-        fine_rate.add(fitted - direct, direct, {1.0, u, u * u});
-    }
-    EXPECT_LT(fine_rate.defect(), kRateDefect);
+    product_.derive(parabolas, false);
+    product_.derive(grids, true);
+    for (const int q : {kRate, kIncidence, kLook, kGround, kSlant})
+        EXPECT_LT(defect(parabolas, q, 10, 1), q == kRate ? kRateDefect : 1e-10) << kUnits[q];
+    EXPECT_LT(defect(grids, kRate, 50, 1), kRateDefect);
+    for (const int q : {kIncidence, kLook, kGround}) EXPECT_LT(defect(grids, q, 100, 50), 1e-10) << kUnits[q];
 }
 
 TEST_P(DerivedPolynomials, StandAroundTheRegion) {
     Derived parabolas, grids;
     dc_.trg0 -= 1e-4;
-    parabolas.range_forms(orbit_, roi_, dc_);
-    grids.grid_forms(orbit_, roi_, dc_);
-    for (const poly* p : {static_cast<poly*>(&parabolas.rate), static_cast<poly*>(&parabolas.theta),
-                          static_cast<poly*>(&parabolas.slant), static_cast<poly*>(&grids.rate)}) {
-        EXPECT_EQ(p->trg0, p == &grids.rate ? dc_.trg0 : roi_.FastStartTime);
-        EXPECT_EQ(p->taz0, 0.0);
-        for (const int unused : {2, 3, 5, 6}) EXPECT_EQ(p->pol[unused], 0.0);
-    }
-    for (const poly* p : {static_cast<poly*>(&grids.theta), static_cast<poly*>(&grids.phi),
-                          static_cast<poly*>(&grids.ground), static_cast<poly*>(&grids.slant)}) {
-        EXPECT_EQ(p->trg0, roi_.FastStartTime);
-        EXPECT_EQ(p->taz0, roi_.SlowStartTime);
+    product_.derive(parabolas, false);
+    product_.derive(grids, true);
+    for (std::size_t q = 0; q < kQuantities; ++q) {
+        const poly &parabola = *parabolas.all()[q], &grid = *grids.all()[q];
+        const bool both_times = q != kRate;
+        EXPECT_EQ(parabola.trg0, roi_.FastStartTime);
+        EXPECT_EQ(parabola.taz0, 0.0);
+        EXPECT_EQ(grid.trg0, both_times ? roi_.FastStartTime : dc_.trg0);
+        EXPECT_EQ(grid.taz0, both_times ? roi_.SlowStartTime : 0.0);
+        for (const int unused : {2, 3, 5, 6}) {
+            EXPECT_EQ(parabola.pol[unused], 0.0);
+            EXPECT_EQ(grid.pol[unused] != 0.0, both_times);
+        }
     }
 }
 
 // The parabola is one curve, wherever the Doppler polynomial has its origin; only far away digits go.
 TEST_P(DerivedPolynomials, OriginOfTheDopplerDoesNotMatter) {
     polyFR near;
-    ASSERT_EQ(orbit_.SVGetFRpoly_v2(&roi_, &dc_, &near), 0);
+    ASSERT_EQ(product_.orbit.SVGetFRpoly_v2(&roi_, &dc_, &near), 0);
     for (const double origin_s : {0.0, roi_.FastStartTime * 3.0, 0.25, -999.0}) {
         polyFR other;
         dc_.trg0 = origin_s;
-        ASSERT_EQ(orbit_.SVGetFRpoly_v2(&roi_, &dc_, &other), 0);
+        ASSERT_EQ(product_.orbit.SVGetFRpoly_v2(&roi_, &dc_, &other), 0);
         for (const double u : {0.0, 0.3, 1.0}) {
-            const double range_s = roi_.FastStartTime + u * roi_.FastTimeLength;
             double a = 0.0, b = 0.0;
-            near.EvaluatePoly(range_s, 0.0, &a);
-            other.EvaluatePoly(range_s, 0.0, &b);
+            near.EvaluatePoly(product_.range(u), 0.0, &a);
+            other.EvaluatePoly(product_.range(u), 0.0, &b);
             EXPECT_NEAR(b, a, 1e-9 + 4e-16 * std::abs(other.pol[4]) * origin_s * origin_s) << origin_s;
         }
     }
 }
 
-// --- against what the missions' own products say
-// ------------------------------------------------------------------
+// --- against what the missions' own products say ----------------------------------------------------------------
 
 nlohmann::json facts_of(const test::Scene& scene) {
     std::ifstream stream{scene.path("_facts.json")};
@@ -302,18 +302,6 @@ double ascending_powers(const nlohmann::json& c, double x) {
     for (std::size_t i = c.size(); i-- > 0;) sum = sum * x + c[i].get<double>();
     return sum;
 }
-
-struct Product {
-    GeneralSAROrbit orbit;
-    ROI_Obj roi;
-    polyDC dc;
-    explicit Product(const test::Scene& scene) {
-        test::load_orbit(scene, orbit);
-        if (roi.read_roi(scene.path(".xml").c_str(), "ROI")) throw std::runtime_error{"no region"};
-    }
-    [[nodiscard]] double azimuth(double share) const { return roi.SlowStartTime + share * roi.SlowTimeLength; }
-    [[nodiscard]] double range(double share) const { return roi.FastStartTime + share * roi.FastTimeLength; }
-};
 
 TEST(DerivedFromAProduct, HasTheProductsFmRate) {
     Product product{test::kScenes[0]};
@@ -351,37 +339,6 @@ TEST(DerivedFromAProduct, HasTheProductsGroundRange) {
     }
 }
 
-// --- failures
-// -----------------------------------------------------------------------------------------------------
-
-/** One of the six operations, on polynomials of its own. */
-struct Operation {
-    const char* name;
-    bool in_both_times;
-    int (*run)(GeneralSAROrbit&, const ROI_Obj*, const polyDC*, Derived&);
-};
-const Operation kOperations[] = {
-    {"SVGetFRpoly", false,
-     [](auto& o, auto* roi, auto* dc, Derived& d) { return o.SVGetFRpoly(roi, dc, &d.rate); }},
-    {"SVGetFRpoly_v2", false,
-     [](auto& o, auto* roi, auto* dc, Derived& d) { return o.SVGetFRpoly_v2(roi, dc, &d.rate); }},
-    {"SVGetSlantToAnglesPolys", false,
-     [](auto& o, auto* roi, auto* dc, Derived& d) {
-         return o.SVGetSlantToAnglesPolys(roi, dc, &d.theta, &d.phi);
-     }},
-    {"SVGetTimeToAnglesPolys", true,
-     [](auto& o, auto* roi, auto* dc, Derived& d) { return o.SVGetTimeToAnglesPolys(roi, dc, &d.theta, &d.phi); }},
-    {"SVGetGroundToSlantPolys", false,
-     [](auto& o, auto* roi, auto* dc, Derived& d) {
-         return o.SVGetGroundToSlantPolys(roi, dc, &d.ground, &d.slant);
-     }},
-    {"SVGetGroundToTimePolys", true,
-     [](auto& o, auto* roi, auto* dc, Derived& d) {
-         return o.SVGetGroundToTimePolys(roi, dc, &d.ground, &d.slant);
-     }},
-};
-void PrintTo(const Operation& operation, std::ostream* out) { *out << operation.name; }
-
 class DerivedFailures : public testing::TestWithParam<Operation> {
 protected:
     [[nodiscard]] int run(const ROI_Obj& roi, const polyDC& dc) {
@@ -389,12 +346,9 @@ protected:
     }
     /** No output has been touched. */
     void expect_unchanged() const {
-        for (const poly* p : {static_cast<const poly*>(&derived_.rate), static_cast<const poly*>(&derived_.theta),
-                              static_cast<const poly*>(&derived_.phi), static_cast<const poly*>(&derived_.ground),
-                              static_cast<const poly*>(&derived_.slant)}) {
+        for (const poly* p : derived_.all()) {
             EXPECT_THAT(p->pol, Each(0.0));
-            EXPECT_EQ(p->trg0, -999.0);
-            EXPECT_EQ(p->taz0, -999.0);
+            EXPECT_EQ(p->trg0 + p->taz0, -1998.0);
         }
     }
 
@@ -479,12 +433,12 @@ TEST_P(DerivedFailures, EveryAllocationMayFail) {
 TEST(DerivedOutputs, NullOutputsAreSkipped) {
     Product scene{test::kScenes[2]};
     Derived both, one;
-    both.grid_forms(scene.orbit, scene.roi, scene.dc);
+    scene.derive(both, true);
     ASSERT_EQ(scene.orbit.SVGetTimeToAnglesPolys(&scene.roi, &scene.dc, nullptr, &one.phi), 0);
     ASSERT_EQ(scene.orbit.SVGetGroundToTimePolys(&scene.roi, &scene.dc, &one.ground, nullptr), 0);
     EXPECT_THAT(one.phi.pol, ElementsAreArray(both.phi.pol));
     EXPECT_THAT(one.ground.pol, ElementsAreArray(both.ground.pol));
-    both.range_forms(scene.orbit, scene.roi, scene.dc);
+    scene.derive(both, false);
     ASSERT_EQ(scene.orbit.SVGetSlantToAnglesPolys(&scene.roi, &scene.dc, &one.theta, nullptr), 0);
     ASSERT_EQ(scene.orbit.SVGetGroundToSlantPolys(&scene.roi, &scene.dc, nullptr, &one.slant), 0);
     EXPECT_THAT(one.theta.pol, ElementsAreArray(both.theta.pol));
