@@ -3,12 +3,12 @@
 #include <algorithm>
 #include <cmath>
 #include <complex>
-#include <cstdio>
 #include <cstring>
 #include <limits>
 #include <numbers>
 #include <random>
 
+#include "../common/product.h"
 #include "../common/session.h"
 #include "quo_base/generalSAR.h"
 
@@ -142,13 +142,7 @@ void write_header(const EchoJob& job, GeneralSAR& product) {
                                        gsStateVectors, gsPolySAR,     gsRoi,   gsSamplingConstants};
     for (int object = 0; object < GeneralSAR::kObjects; ++object) product.GSdisable(static_cast<GSObject>(object));
     for (const GSObject object : kDescribed) product.GSenable(object);
-    const std::string header = job.raster + ".hdr";
-    std::remove(header.c_str());
-    errno = 0;
-    quorelxml::setExactNumbers(true);  // 15 digits would cost the azimuth times their last microsecond
-    product.GSwrite(header.c_str());
-    GeneralSAR written;
-    require(written.GSread(header.c_str()), header + ": cannot be written");
+    write_product(product, job.raster + ".hdr");
 }
 
 /** Adds the pulse, delayed by `delay` samples, to a line. */

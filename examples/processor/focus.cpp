@@ -7,6 +7,7 @@
 #include <optional>
 
 #include "../common/geometry.h"
+#include "../common/product.h"
 #include "../common/progress.h"
 #include "azimuth_focusing.h"
 #include "quo_base/generalSAR.h"
@@ -27,6 +28,8 @@ public:
 private:
     void read_header();
     void check_memory(int lines, int samples) const;
+    void create(DataFile& raster);
+    void finish(DataFile& raster);
     void compress_range();
     void read_raw(RangeCompression& compression, int first, int lines);
     void focus_azimuth();
@@ -77,12 +80,21 @@ void Processor::check_memory(int lines, int samples) const {
                       QUO_NO_MEMORY};
 }
 
-DataFile& describe(DataFile& raster, const std::string& name, int lines, int samples) {
+void describe(DataFile& raster, const std::string& name, int lines, int samples) {
     require(raster.setFilename(name.c_str()), name + ": the name is too long");
     raster.NrOfLinesPerImage = lines;
     raster.NrOfPixelsPerLine = samples;
     raster.CellType = FLOAT_COMPLEX;
-    return raster;
+}
+
+void Processor::create(DataFile& raster) {
+    stopwatch_.time(Work::kWriting,
+                    [&] { require(raster.open(1), std::string{raster.FileName} + ": cannot be written"); });
+}
+
+void Processor::finish(DataFile& raster) {
+    stopwatch_.time(Work::kWriting,
+                    [&] { require(raster.close(), std::string{raster.FileName} + ": cannot be written"); });
 }
 
 void Processor::read_raw(RangeCompression& compression, int first, int lines) {
@@ -108,7 +120,7 @@ void Processor::compress_range() {
     data_.SetFastAxe(product_.roi.Roi.FastStartTime + compression.delay_s(), product_.roi.Roi.FastTimeDelta,
                      compression.samples());
     describe(compressed_, job_.image + ".rc", lines, data_.Samples);
-    require(compressed_.open(1), std::string{compressed_.FileName} + ": cannot be written");
+    create(compressed_);
     product_.bufferFile.open(BufferFile::READ);
     for (int first = 0; first < lines; first += block_lines) {
         const int count = std::min(block_lines, lines - first);
@@ -125,7 +137,7 @@ void Processor::compress_range() {
         progress_.show(kRangeShare * first / lines);
     }
     product_.bufferFile.close();
-    require(compressed_.close(), std::string{compressed_.FileName} + ": cannot be written");
+    finish(compressed_);
 }
 
 /** Reads what the raster has of a block; beyond its borders there are zeros. */
@@ -193,12 +205,12 @@ void Processor::focus_azimuth() {
     stopwatch_.time(Work::kPlanning, [&] { focusing.emplace(layout_, band_, data_.FastTimeDelta); });
     DataFile image;
     describe(image, job_.image, layout_.lines, layout_.samples);
-    require(image.open(1), job_.image + ": cannot be written");
+    create(image);
     require(compressed_.open(0), std::string{compressed_.FileName} + ": cannot be read");
     for (int line = 0; line < layout_.lines; line += layout_.step_lines) focus_strip(*focusing, image, line);
     require(compressed_.close(), std::string{compressed_.FileName} + ": cannot be closed");
-    require(image.close(), job_.image + ": cannot be written");
-    if (processing_.EraseTemp != 0) std::remove(compressed_.FileName);
+    finish(image);
+    if (processing_.EraseTemp != 0) stopwatch_.time(Work::kWriting, [&] { std::remove(compressed_.FileName); });
 }
 
 /** Writes the image's product header: that of the raw data, with what focusing changed. */
@@ -225,11 +237,7 @@ void Processor::write_header() {
     product.GSdisable(gsDataFile);  // the same section as the raster's
     product.GSenable(gsSpectralWindows);
     product.GSenable(gsGeoCoords);
-    const std::string header = job_.image + ".hdr";
-    std::remove(header.c_str());
-    errno = 0;
-    quorelxml::setExactNumbers(true);
-    product.GSwrite(header.c_str());
+    write_product(product, job_.image + ".hdr");
 }
 
 FocusResult Processor::run() {

@@ -1,0 +1,30 @@
+#!/bin/sh
+# Part of the main job: the chain from echoes to a geolocated image. Simulates, focuses, measures and shows.
+# Usage: scripts/demo_chain.sh BUILD_FOLDER
+set -eu
+cd "$(dirname "$0")/.."
+quo=$1/tools/quo/quo
+chain=$1/examples/chain
+scene=tests/data/scenes/s1a_iw1_slc_20220104_asc.xml
+targets=examples/echo_simulator/targets.csv
+folder=demo-output/chain
+rm -rf "$folder"
+mkdir -p "$folder"
+echo
+echo "Nine reflectors, seen from the orbit of the first scene:"
+"$chain/echo_simulator" "$scene" "$targets" "$folder/raw" --type short --big-endian --prefix 16 --noise 20 --doppler 230
+"$chain/processor" "$folder/raw" "$folder/image" --configuration examples/processor/focus.xml --verbose
+echo
+echo "Where they are in the focused image, and what they look like (theory: sidelobes -13.3 dB, integrated -10.2 dB):"
+"$chain/point_targets" "$folder/image" "$targets"
+echo
+"$quo" info "$folder/image.hdr"
+"$quo" quicklook "$folder/raw" "$folder/raw.png"
+"$quo" quicklook "$folder/image" "$folder/image.png" --db 0:40
+"$quo" footprint "$folder/image.hdr" >"$folder/footprint.geojson"
+if grep -l ERROR "$folder"/*.report.txt; then
+    echo "demo_chain.sh: a report has errors" >&2
+    exit 1
+fi
+echo
+echo "Pictures: $folder/raw.png before and $folder/image.png after focusing; outline: $folder/footprint.geojson"
