@@ -5,6 +5,7 @@
 #include <nlohmann/json.hpp>
 
 #include "quo_base/debugIO.h"
+#include "raster_folder.h"
 #include "tool.h"
 
 namespace {
@@ -116,19 +117,13 @@ double value_of(const std::string& line) {
     return std::stod(line.substr(command.size()));
 }
 
-// Open, title, rising shares that end at 1, close; also on the way out of a job that fails.
-TEST(Waitbar, FollowsALongJob) {
-    const test::TemporaryFolder folder;
-    const std::string table = folder.file("table.csv"), header = test::scene_file("s1a_iw1_slc_20220104_asc");
-    std::string rows = "azimuth_time_s,range_time_s\n";
-    for (int i = 0; i < 300; ++i) rows += "1167930358.5,0.0054\n";
-    test::write_text(table, rows);
-    const Finished finished = quo({"geolocate", header, "--to", "ground", "--input", table, "--waitbar"});
+/** Open, title, rising shares that end at 1, close. */
+void expect_waitbar(const Finished& finished, const std::string& title) {
     EXPECT_EQ(finished.exit_status, 0);
     const auto lines = finished.messages();
     ASSERT_GT(lines.size(), 3U);
     EXPECT_EQ(lines[0], "USE_WAITBAR");
-    EXPECT_EQ(lines[1], "SET_TITLE: Geolocating");
+    EXPECT_EQ(lines[1], "SET_TITLE: " + title);
     EXPECT_EQ(lines.back(), "CLOSE_WAITBAR");
     double before = -1.0;
     for (std::size_t i = 2; i + 1 < lines.size(); ++i) {
@@ -136,12 +131,26 @@ TEST(Waitbar, FollowsALongJob) {
         before = value_of(lines[i]);
     }
     EXPECT_EQ(before, 1.0);
-    EXPECT_LE(lines.size(), 110U);
+    EXPECT_LE(lines.size(), 110U) << "a parent process is told about every hundredth";
+}
 
-    const Finished failed =
-        quo({"geolocate", header, "--to", "ground", "--input", table, "--output", "/dev/full", "--waitbar"});
+class Waitbar : public test::RasterFolder {};
+
+TEST_F(Waitbar, FollowsTheLongJobs) {
+    const std::string raster = make_sparse("in.raw", 3000, 1000, FLOAT_COMPLEX);
+    expect_waitbar(quo({"convert", raster, file("out.raw"), "--waitbar"}), "Converting");
+    expect_waitbar(quo({"quicklook", raster, file("out.png"), "--waitbar"}), "Quick look");
+
+    const std::string table = file("table.csv"), header = test::scene_file("s1a_iw1_slc_20220104_asc");
+    std::string rows = "azimuth_time_s,range_time_s\n";
+    for (int i = 0; i < 300; ++i) rows += "1167930358.5,0.0054\n";
+    test::write_text(table, rows);
+    std::vector<std::string> job{"geolocate", header, "--to", "ground", "--input", table, "--waitbar"};
+    expect_waitbar(quo(job), "Geolocating");
+    job.insert(job.end(), {"--output", "/dev/full"});
+    const Finished failed = quo(job);
     EXPECT_EQ(failed.exit_status, 1);
-    EXPECT_THAT(failed.err, HasSubstr("\nCLOSE_WAITBAR\nquo: "));
+    EXPECT_THAT(failed.err, HasSubstr("\nCLOSE_WAITBAR\nquo: ")) << "closed before the cause is told";
 }
 
 }  // namespace
