@@ -1,3 +1,5 @@
+#include "support/scenes.h"
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -7,9 +9,9 @@
 
 #include "orbit/made_orbits.h"
 #include "support/geometry.h"
-#include "support/scenes.h"
 
-// The ground point of a sample and the geometry there.
+// The bundled scenes: the ground point of a sample and the geometry there; from the ground to azimuth time and
+// range time, and there and back again.
 
 namespace {
 
@@ -20,9 +22,9 @@ struct Sample {
     Vec3 platform, velocity, point;
 };
 
-class SceneSamples : public testing::TestWithParam<test::Scene> {
+class RealScene : public testing::TestWithParam<test::Scene> {
 protected:
-    SceneSamples() { test::load_orbit(GetParam(), orbit_); }
+    RealScene() { test::load_orbit(GetParam(), orbit_); }
 
     /** Calls `check` for samples all over the scene; times are multiples of 2^-10 s, so that steps of half a
      * second on them are exact. */
@@ -42,7 +44,7 @@ protected:
     std::vector<test::TiePoint> points_ = test::load_tie_points(GetParam());
     test::Extent extent_ = test::extent_of(points_);
 };
-INSTANTIATE_TEST_SUITE_P(Bundled, SceneSamples, testing::ValuesIn(test::kScenes),
+INSTANTIATE_TEST_SUITE_P(Bundled, RealScene, testing::ValuesIn(test::kScenes),
                          [](const auto& scene) { return scene.param.name; });
 
 /** Relative agreement with a value that is not near zero. */
@@ -50,7 +52,7 @@ void expect_close(double value, double truth, double relative) {
     EXPECT_NEAR(value, truth, relative * std::abs(truth));
 }
 
-TEST_P(SceneSamples, AnglesAndSpeedAreThoseOfTheVectors) {
+TEST_P(RealScene, AnglesAndSpeedAreThoseOfTheVectors) {
     for (const double doppler : {0.0, GetParam().doppler_hz}) {
         for_samples(doppler, [&](const Sample& s) {
             double incidence = 0.0, look = 0.0;
@@ -66,7 +68,7 @@ TEST_P(SceneSamples, AnglesAndSpeedAreThoseOfTheVectors) {
 // The mission's angles at its own tie points, after the conversion from its vertical to ours. Stated to a double's
 // digits for the satellite, to a float's for the aircraft; where tie points have heights, they are seen from the
 // model's platform, as the library's own angles belong to the point on the ellipsoid.
-TEST_P(SceneSamples, AnglesAgreeWithTheProduct) {
+TEST_P(RealScene, AnglesAgreeWithTheProduct) {
     for (const test::TiePoint& tie : points_) {
         const Vec3 platform = test::position_at(orbit_, tie.azimuth_time_s);
         const Vec3 target = test::geodetic_point(tie.latitude_deg, tie.longitude_deg, tie.height_m);
@@ -88,7 +90,7 @@ TEST_P(SceneSamples, AnglesAgreeWithTheProduct) {
 
 /** Doppler of a fixed point from the change of its distance: -(2 / lambda) dR/dt, and once more for the FM rate.
  */
-TEST_P(SceneSamples, FmRateIsTheDerivativeOfTheDoppler) {
+TEST_P(RealScene, FmRateIsTheDerivativeOfTheDoppler) {
     for (const double doppler : {0.0, GetParam().doppler_hz}) {
         for_samples(doppler, [&](const Sample& s) {
             constexpr double h = 0.5;
@@ -107,7 +109,7 @@ TEST_P(SceneSamples, FmRateIsTheDerivativeOfTheDoppler) {
     }
 }
 
-TEST_P(SceneSamples, SquintedLinesLeaveAtTheirAngleAndEndOnTheGround) {
+TEST_P(RealScene, SquintedLinesLeaveAtTheirAngleAndEndOnTheGround) {
     for (const double squint : {0.0, 3.7, -11.3}) {
         for_samples(0.0, [&](const Sample& s) {
             Vec3 p{};
@@ -180,6 +182,89 @@ TEST(Samples, AllFormsOfACallAgree) {
         Vec3 aliased = test::position_at(orbit, t);
         ASSERT_EQ(orbit.sat2earth(aliased.v, test::velocity_at(orbit, t).v, range, aliased.v), 0);
         EXPECT_EQ(aliased[2], full[2]);
+    }
+}
+
+// --- from the ground to the image -------------------------------------------------------------------------------
+
+TEST_P(RealScene, SeesTiePointsWhereTheirProductDoes) {
+    for (const test::TiePoint& point : points_) {
+        const Vec3 p = test::geodetic_point(point.latitude_deg, point.longitude_deg, point.height_m);
+        double t[2], range[2];
+        ASSERT_EQ(orbit_.earth2sat(p.v, &t[0], &range[0]), 0);
+        ASSERT_EQ(orbit_.earth2satPrecise(p.v, &t[1], &range[1]), 0);
+        for (int i = 0; i < 2; ++i) {
+            EXPECT_NEAR(t[i], point.azimuth_time_s, GetParam().time_reach_s);
+            EXPECT_NEAR(range[i], point.range_time_s, 2.0 / test::kLightSpeed * GetParam().range_reach_m);
+        }
+        EXPECT_NEAR(orbit_.earth2satAzimuth(p.v), t[0], 2.4e-7);  // a double's last bit
+        EXPECT_NEAR(orbit_.earth2satRange(p[0], p[1], p[2]), range[0], 1e-14);
+    }
+}
+
+/** How far a sample's coordinates may be off after a journey to the ground and back, and the point after one more.
+ */
+struct Closure {
+    double time_s, range_s, point_m;
+};
+
+/** Samples all over the extent of the scene, times on whole microseconds, either look side, three Dopplers. */
+void expect_closed(GeneralSAROrbit& orbit, const test::Extent& extent, double doppler_hz, const Closure& within) {
+    constexpr int kSteps = 23;
+    for (const int side : {+5, 0, -1}) {  // not negative: right
+        orbit.setLookSign(side);
+        for (const double doppler : {0.0, doppler_hz, -doppler_hz}) {
+            for (int i = 0; i <= kSteps * kSteps; ++i) {
+                const double along = static_cast<double>(i) / (kSteps * kSteps);
+                const double across = static_cast<double>(i * 7 % (kSteps + 1)) / kSteps;
+                const double t = extent.first_s + along * (extent.last_s - extent.first_s);
+                const double range = extent.near_s + across * (extent.far_s - extent.near_s);
+                Vec3 p{}, again{};
+                double t_back = 0.0, range_back = 0.0;
+                ASSERT_EQ(orbit.sat2earth(t, range, doppler, p.v), 0);
+                ASSERT_EQ(orbit.earth2sat(p.v, &t_back, &range_back, doppler), 0);
+                EXPECT_NEAR(t_back, t, within.time_s);
+                EXPECT_NEAR(range_back, range, within.range_s);
+                ASSERT_EQ(orbit.sat2earth(t_back, range_back, doppler, again.v), 0);
+                EXPECT_LT(test::norm(again - p), within.point_m);
+                EXPECT_NEAR(test::height_above_ellipsoid(p), 0.0, 1e-5);
+                const Vec3 from = test::position_at(orbit, t);
+                const Vec3 right = test::cross(test::velocity_at(orbit, t), from);
+                EXPECT_EQ(test::dot(right, p - from) > 0.0, side >= 0);
+            }
+        }
+    }
+}
+
+// Seconds since 1985 are known to 1.2e-7 s in a double, almost a millimetre of flight.
+TEST_P(RealScene, ClosesOnAbsoluteTimes) {
+    expect_closed(orbit_, extent_, GetParam().doppler_hz, {3e-7, 1e-12, 2e-3});
+}
+
+// The same orbit with its times moved near zero shows what the geometry itself does.
+TEST_P(RealScene, ClosesBeyondTheRoundingOfAbsoluteTimes) {
+    const double move = std::floor(extent_.first_s);
+    orbit_.t0SV_s -= move;
+    ASSERT_EQ(orbit_.computeApproximateSV(), 0);
+    const test::Extent moved{extent_.first_s - move, extent_.last_s - move, extent_.near_s, extent_.far_s};
+    expect_closed(orbit_, moved, GetParam().doppler_hz, {1e-9, 1e-12, 1e-5});
+}
+
+// One product's tie points all lie on the ellipsoid: there the forward direction has the same truth, within the
+// tie points' own microsecond.
+TEST(SeaScene, FindsTiePointsFromTheirTimes) {
+    const test::Scene& scene = test::kScenes[1];
+    ASSERT_TRUE(scene.at_sea_level);
+    GeneralSAROrbit orbit;
+    test::load_orbit(scene, orbit);
+    for (const test::TiePoint& point : test::load_tie_points(scene)) {
+        Vec3 p{};
+        double latitude = 0.0, longitude = 0.0;
+        ASSERT_EQ(orbit.sat2earth(point.azimuth_time_s, point.range_time_s, p.v), 0);
+        EXPECT_LT(test::norm(p - test::geodetic_point(point.latitude_deg, point.longitude_deg)), 0.02);
+        ASSERT_EQ(orbit.SVGetLatLon(point.azimuth_time_s, point.range_time_s, &latitude, &longitude), 0);
+        EXPECT_NEAR(latitude, point.latitude_deg, 2e-7);
+        EXPECT_NEAR(longitude, point.longitude_deg, 2e-7);
     }
 }
 
