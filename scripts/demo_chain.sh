@@ -20,7 +20,7 @@ echo "Where they are in the focused image, and what they look like (theory: side
 echo
 "$quo" info "$folder/image.hdr"
 "$quo" quicklook "$folder/raw" "$folder/raw.png"
-"$quo" quicklook "$folder/image" "$folder/image.png" --db 0:40
+"$quo" quicklook "$folder/image" "$folder/image.png" --db -30:30
 "$quo" footprint "$folder/image.hdr" >"$folder/footprint.geojson"
 if grep -l ERROR "$folder"/*.report.txt; then
     echo "demo_chain.sh: a report has errors" >&2

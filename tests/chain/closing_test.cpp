@@ -1,6 +1,8 @@
 #include <gmock/gmock.h>
 
 #include <cmath>
+#include <complex>
+#include <regex>
 #include <string>
 #include <vector>
 
@@ -132,5 +134,84 @@ TEST_P(Chain, FocusesTargetsWhereTheyAre) {
 }
 INSTANTIATE_TEST_SUITE_P(Acquisitions, Chain, testing::ValuesIn(kAcquisitions),
                          [](const auto& row) { return row.param.name; });
+
+/** A small raster: two targets, a narrow beam, a short pulse, noise. */
+class SmallRaster : public testing::Test {
+protected:
+    void SetUp() override {
+        echoes_.targets = {{"south", 41.2037614, 11.6878159, 0.0, 300.0},
+                           {"north", 41.2537614, 11.6678159, 0.0, 300.0}};
+        echoes_.beam_bandwidth_hz = 513.7;
+        echoes_.pulse_s = 2.1e-6;
+        echoes_.doppler_hz = -713.9;
+        echoes_.noise = 10.0;
+        example::simulate_echoes(echoes_);
+        azimuth_.AzimuthOverlap = 0;
+    }
+    example::FocusResult focus(const char* image, bool waitbar = false) {
+        return example::focus({echoes_.raster, folder_.file(image), 0.0, waitbar}, azimuth_, processing_);
+    }
+    std::vector<fcomplex> pixels(const char* image, const example::FocusResult& size) {
+        std::vector<fcomplex> values(static_cast<std::size_t>(size.lines) *
+                                     static_cast<std::size_t>(size.samples));
+        BufferFile raster{folder_.file(image).c_str()};
+        EXPECT_EQ(raster.readhdr(), 0);
+        raster.open(BufferFile::READ);
+        raster.readbuffer(values.data(), 0, size.lines, 0, 0);
+        return values;
+    }
+
+    test::TemporaryFolder folder_;
+    example::EchoJob echoes_{test::kScenes[0].path(".xml"), folder_.file("raw"), {}};
+    AzimuthConf azimuth_;
+    generalProcessingConf processing_;
+};
+
+// Blocks overlap by whole apertures, so that an image does not show where they met: not in noise either, which has
+// no margins as a target has.
+TEST_F(SmallRaster, DoesNotShowItsBlocks) {
+    const example::FocusResult whole = focus("whole");
+    azimuth_.LinesInBlock = azimuth_.SamplesInBlock = 1;
+    azimuth_.RangeOverlap = 16;
+    test::CapturedStderr captured;
+    const example::FocusResult cut = focus("cut", true);
+    EXPECT_THAT(captured.text(), testing::MatchesRegex("USE_WAITBAR\nSET_TITLE: Focusing\n(SET_WAITBAR: .*\n)+"
+                                                       "CLOSE_WAITBAR\n"));
+    ASSERT_EQ(cut.lines, whole.lines);
+    ASSERT_EQ(cut.samples, whole.samples);
+    ASSERT_LT(2 * cut.block_lines, whole.block_lines);
+    ASSERT_LT(2 * cut.block_samples, whole.block_samples);
+    const std::vector<fcomplex> one = pixels("whole", whole), many = pixels("cut", cut);
+    double power = 0.0, difference = 0.0;
+    for (std::size_t i = 0; i < one.size(); ++i) {
+        power += static_cast<double>(std::norm(one[i]));
+        difference += static_cast<double>(std::norm(many[i] - one[i]));
+    }
+    EXPECT_LT(difference, 1e-3 * power);
+}
+
+TEST_F(SmallRaster, IsRefusedWhereItCannotBeFocused) {
+    const std::string header = echoes_.raster + ".hdr", good = test::read_text(header);
+    struct Fault {
+        const char *name, *element, *text;
+    };
+    constexpr Fault kFaults[] = {{"longer than the file", "NrOfLinesPerImage", "1000000000"},
+                                 {"other than the region", "Lines", "7"},
+                                 {"no PRF", "prf_hz", "-999"},
+                                 {"a pulse without length", "PulseLength", "0"},
+                                 {"a pulse longer than the line", "PulseLength", "0.01"},
+                                 {"no Doppler polynomials", "ndc", "0"},
+                                 {"a beam wider than the PRF", "Baz_hz", "1800"}};
+    for (const Fault& fault : kFaults) {
+        const std::regex element{std::string{"<"} + fault.element + ">[^<]*<"};
+        ASSERT_TRUE(std::regex_search(good, element)) << fault.element;
+        test::write_text(
+            header, std::regex_replace(good, element, std::string{"<"} + fault.element + ">" + fault.text + "<"));
+        EXPECT_THROW(focus("refused"), example::Failure) << fault.name;
+    }
+    test::write_text(header, good);
+    processing_.Memory = 0;
+    EXPECT_THROW(focus("refused"), example::Failure);
+}
 
 }  // namespace
