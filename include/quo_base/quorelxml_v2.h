@@ -114,15 +114,19 @@ protected:
     /** The first element (the one at `index`, from 0) of a field, or null. The handle is libxml2's node. */
     void* getNode(int channel, const char* field) const;
     void* getNode(int channel, const char* field, int index) const;
+    /** How many elements a field path leads to, and whether there are any, or that many; 0 and false without a
+     * document. */
     int countNodes(int channel, const char* field) const;
     bool channelExists(int channel) const;
     bool fieldExists(int channel, const char* field) const;
     bool fieldHasCount(int channel, const char* field, int count) const;
+    /** Appends the channel, and the field's elements from the first that is missing on, where there is none yet; a
+     * fresh document is made where there is no header. 0; 1 for a path that XML cannot hold; 7. */
     int createChannel(int channel) noexcept;
     int createField(int channel, const char* field) noexcept;
     /** Creates the field and appends to its parent until `count` elements bear its name. */
     int createField(int channel, const char* field, int count) noexcept;
-    /** Removes every element of the field. */
+    /** Removes every element of the field. 0, also where there is none. */
     int clearField(int channel, const char* field) noexcept;
     /** Builds the scan format of a list: type 0 double, 1 float, 2 int, 3 string; cut to whole items within 4096
      * characters. Lists are read with formats of their own, whose length does not grow with the list. */
