@@ -1,17 +1,22 @@
-// Blocks of 512 lines x 8192 samples from and to the page cache, beside bare pread and pwrite of the same bytes,
-// and small buffered reads beside memcpy.
+// Blocks of 512 lines x 8192 samples from and to the page cache, beside bare pread and pwrite of the same bytes
+// and, where its headers are installed, beside GDAL; and small buffered reads beside memcpy.
 #include <benchmark/benchmark.h>
 #include <fcntl.h>
 #include <unistd.h>
 
+#include <cstdint>
 #include <cstdlib>
 #include <cstring>
+#include <fstream>
 #include <string>
 #include <vector>
 
 #include "quo_base/ckerr.h"
 #include "quo_base/datafile.h"
 #include "ratio_reporter.h"
+#ifdef QUO_HAVE_GDAL
+#include <gdal.h>
+#endif
 
 namespace {
 
@@ -102,6 +107,59 @@ void write_bare(benchmark::State& state) {
     count(state, raster.bytes);
 }
 
+#ifdef QUO_HAVE_GDAL
+/** The raster as GDAL sees it. */
+class GdalBand {
+public:
+    GdalBand(const TemporaryRaster& raster, const char* type) : description_{raster.path + ".vrt"} {
+        GDALAllRegister();
+        // Every block comes from the page cache, as for the other readers: what GDAL keeps itself is less than the
+        // file.
+        GDALSetCacheMax64(std::int64_t{1} << 25);
+        const std::string size = std::to_string(raster.file.pixelsizeof());
+        std::ofstream{description_} << "<VRTDataset rasterXSize=\"" << kSamples << "\" rasterYSize=\""
+                                    << kLines * kBlocks << "\"><VRTRasterBand dataType=\"" << type
+                                    << "\" band=\"1\" subClass=\"VRTRawRasterBand\"><SourceFilename>"
+                                    << raster.path << "</SourceFilename><PixelOffset>" << size
+                                    << "</PixelOffset><LineOffset>" << kSamples * raster.file.pixelsizeof()
+                                    << "</LineOffset><ByteOrder>MSB</ByteOrder></VRTRasterBand></VRTDataset>";
+        data_set_ = GDALOpen(description_.c_str(), GA_ReadOnly);
+    }
+    ~GdalBand() {
+        if (data_set_) GDALClose(data_set_);
+        unlink(description_.c_str());
+    }
+    GdalBand(const GdalBand&) = delete;
+    GdalBand& operator=(const GdalBand&) = delete;
+
+    bool read(int block, void* to, GDALDataType type) const {
+        return data_set_ && GDALRasterIO(GDALGetRasterBand(data_set_, 1), GF_Read, 0, kLines * block, kSamples,
+                                         kLines, to, kSamples, kLines, type, 0, 0) == CE_None;
+    }
+
+private:
+    std::string description_;
+    GDALDatasetH data_set_ = nullptr;
+};
+
+template <typename T, int Type>
+void read_gdal(benchmark::State& state) {
+    const TemporaryRaster raster{Type};
+    const bool is_complex = Type == SHORT_COMPLEX;
+    const GdalBand band{raster, is_complex ? "CInt16" : "Float32"};
+    std::vector<T> block(static_cast<std::size_t>(kLines) * kSamples);
+    int next = 0;
+    for (auto _ : state) {
+        if (!band.read(next++ % kBlocks, block.data(), is_complex ? GDT_CFloat32 : GDT_Float32))
+            state.SkipWithError("GDAL");
+        benchmark::DoNotOptimize(block.data());
+    }
+    count(state, raster.bytes);
+}
+BENCHMARK(read_gdal<fcomplex, SHORT_COMPLEX>)->Name("gdal_short_complex");
+BENCHMARK(read_gdal<float, FLOAT32>)->Name("gdal_float");
+#endif
+
 // Not a constant for the compiler: both sides copy pieces of a length told at run time.
 volatile int piece_length = 512;
 void read_pieces(benchmark::State& state) {
@@ -147,6 +205,8 @@ int main(int argc, char** argv) {
         argc, argv,
         {{"read SHORT_COMPLEX to fcomplex / pread", "read_short_complex", "pread_short_complex", 1.0 / 0.45},
          {"read FLOAT32 swapped / pread", "read_float", "pread_float", 1.0 / 0.75},
+         {"read SHORT_COMPLEX to fcomplex / GDAL", "read_short_complex", "gdal_short_complex", 0.25},
+         {"read FLOAT32 swapped / GDAL", "read_float", "gdal_float", 0.25},
          {"write fcomplex to SHORT_COMPLEX / pwrite", "write_short_complex", "pwrite_short_complex", 2.5},
          {"buffered pieces of 512 bytes / memcpy", "read_pieces", "copy_pieces", 2.0}});
     exit_ckerr();
