@@ -125,59 +125,50 @@ protected:
 INSTANTIATE_TEST_SUITE_P(Passes, Coregistration, testing::ValuesIn(kRepeats),
                          [](const auto& row) { return row.param.name; });
 
+// Both forms follow the geometry, and the way back from the slave's times is as good as the way there.
 TEST_P(Coregistration, FollowsTheGeometryInBothForms) {
     make_mapping();
     ASSERT_EQ(matches_.size(), 1000U);
-    double range_worst = 0.0, azimuth_worst = 0.0;
-    const auto compare = [&](double range_s, double azimuth_s, const Match& m) {
-        range_worst = std::max(range_worst, std::abs(range_s - m.slave_range_s) / slave_.FastTimeDelta);
-        azimuth_worst = std::max(azimuth_worst, std::abs(azimuth_s - m.slave_azimuth_s) / slave_.SlowTimeDelta);
-    };
-    const auto verdict = [&](const char* form) {
+    const auto verdict = [&](const char* form, const auto& range_s, const auto& azimuth_s) {
+        double range_worst = 0.0, azimuth_worst = 0.0;
+        for (const Match& m : matches_) {
+            range_worst = std::max(range_worst, std::abs(range_s(m) - m.slave_range_s) / slave_.FastTimeDelta);
+            azimuth_worst =
+                std::max(azimuth_worst, std::abs(azimuth_s(m) - m.slave_azimuth_s) / slave_.SlowTimeDelta);
+        }
         std::printf("%-26s %-8s range %9.3g samples  azimuth %9.3g lines\n", GetParam().name, form, range_worst,
                     azimuth_worst);
         EXPECT_LT(range_worst, GetParam().range_bound) << form;
         EXPECT_LT(azimuth_worst, GetParam().azimuth_bound) << form;
-        range_worst = azimuth_worst = 0.0;
     };
-    for (const Match& m : matches_)
-        compare(fit_.evaluateSLtimeRange(m.range_s, m.azimuth_s),
-                fit_.evaluateSLtimeAzimuth(m.range_s, m.azimuth_s), m);
-    verdict("time");
-
+    const auto range_s = [&](const Match& m) { return fit_.evaluateSLtimeRange(m.range_s, m.azimuth_s); };
+    const auto azimuth_s = [&](const Match& m) { return fit_.evaluateSLtimeAzimuth(m.range_s, m.azimuth_s); };
+    verdict("time", range_s, azimuth_s);
     ASSERT_EQ(fit_.Time2Samples(&master_, &slave_), 0);
-    for (const Match& m : matches_) {
+    const auto in_samples = [&](const double* c, const Match& m) {
         const double ds = (m.range_s - master_.FastStartTime) / master_.FastTimeDelta - fit_.Rg_Samples_Origin;
         const double dl = (m.azimuth_s - master_.SlowStartTime) / master_.SlowTimeDelta - fit_.Az_Samples_Origin;
-        const auto value = [&](const double* c) { return (c[0] * ds + c[1]) * ds + c[2] * dl + c[3]; };
-        compare(slave_.FastStartTime + value(fit_.Rg_Fit_Coeff) * slave_.FastTimeDelta,
-                slave_.SlowStartTime + value(fit_.Az_Fit_Coeff) * slave_.SlowTimeDelta, m);
-    }
-    verdict("samples");
-
+        return (c[0] * ds + c[1]) * ds + c[2] * dl + c[3];
+    };
+    verdict(
+        "samples",
+        [&](const Match& m) {
+            return slave_.FastStartTime + in_samples(fit_.Rg_Fit_Coeff, m) * slave_.FastTimeDelta;
+        },
+        [&](const Match& m) {
+            return slave_.SlowStartTime + in_samples(fit_.Az_Fit_Coeff, m) * slave_.SlowTimeDelta;
+        });
     ASSERT_EQ(fit_.ConvertPolys(&master_, &slave_), 0);
-    for (const Match& m : matches_)
-        compare(fit_.evaluateSLtimeRange(m.range_s, m.azimuth_s),
-                fit_.evaluateSLtimeAzimuth(m.range_s, m.azimuth_s), m);
-    verdict("back");
-}
+    verdict("back", range_s, azimuth_s);
 
-// The way back from the slave's times is as good as the way there; its sign conventions are the geometry's.
-TEST_P(Coregistration, LeadsBackToTheMaster) {
-    make_mapping();
-    double range_worst = 0.0, azimuth_worst = 0.0;
     for (const Match& m : matches_) {
-        double range_s = 0.0, azimuth_s = 0.0;
-        ASSERT_EQ(fit_.evaluateMAtime(m.slave_range_s, m.slave_azimuth_s, &range_s, &azimuth_s), 0);
-        range_worst = std::max(range_worst, std::abs(range_s - m.range_s) / master_.FastTimeDelta);
-        azimuth_worst = std::max(azimuth_worst, std::abs(azimuth_s - m.azimuth_s) / master_.SlowTimeDelta);
-        double there_range_s = 0.0, there_azimuth_s = 0.0;
-        fit_.evaluateSLtime(range_s, azimuth_s, &there_range_s, &there_azimuth_s);
-        EXPECT_NEAR(there_range_s, m.slave_range_s, 1e-15);
-        EXPECT_NEAR(there_azimuth_s, m.slave_azimuth_s, 5e-7);
+        Match back = m;
+        ASSERT_EQ(fit_.evaluateMAtime(m.slave_range_s, m.slave_azimuth_s, &back.range_s, &back.azimuth_s), 0);
+        EXPECT_NEAR(back.range_s, m.range_s, 1.1 * GetParam().range_bound * master_.FastTimeDelta);
+        EXPECT_NEAR(back.azimuth_s, m.azimuth_s, 1.1 * GetParam().azimuth_bound * master_.SlowTimeDelta);
+        EXPECT_NEAR(range_s(back), m.slave_range_s, 1e-15);
+        EXPECT_NEAR(azimuth_s(back), m.slave_azimuth_s, 5e-7);
     }
-    EXPECT_LT(range_worst, 1.1 * GetParam().range_bound);
-    EXPECT_LT(azimuth_worst, 1.1 * GetParam().azimuth_bound);
 }
 
 // The mapping says what a baseline does: the range grows by its part along the line of sight, the lines shift by

@@ -77,9 +77,9 @@ TEST(GeoCoordsWithoutOrbit, AreRefused) {
     GeneralSAROrbit orbit;
     geoCoords_Obj grid;
     GSRoi_Obj roi;
-    EXPECT_EQ(orbit.SVGetGeoCoords(&grid, &roi), 1);
-    EXPECT_EQ(orbit.SVGetGeoCoords(nullptr, &roi), 1);
-    EXPECT_EQ(orbit.SVGetGeoCoords(&grid, nullptr), 1);
+    for (const int status : {orbit.SVGetGeoCoords(&grid, &roi), orbit.SVGetGeoCoords(nullptr, &roi),
+                             orbit.SVGetGeoCoords(&grid, nullptr)})
+        EXPECT_EQ(status, 1);
     EXPECT_EQ(grid.Center.Latitude, -999.0);
 }
 

@@ -125,25 +125,20 @@ protected:
 TEST_F(BufferFileBytes, TellsWhereTheBufferStandsAsDescribed) {
     file_.open(3);
     file_.initbuffer(20, 5);
-    char bytes[30];
+    char bytes[8];
     ASSERT_EQ(file_.read(bytes, 8), 8);
     EXPECT_EQ(file_.tell(), 0) << "reading and writing: the buffer's start";
     file_.seek(70, 0);
     EXPECT_EQ(file_.tell(), 60) << "half a buffer before the target";
     file_.close();
-    EXPECT_FALSE(file_.is_buffered());
     EXPECT_EQ(file_.tell(), 0);
-
     file_.open(1);
     file_.initbuffer(20, 5);
     file_.seek(70, 0);
-    EXPECT_EQ(file_.tell(), 70);
-    file_.seek(0, 0);
-    file_.seek(0, 1);
-    file_.seek(0, 2);
-    EXPECT_EQ(file_.tell(), 70) << "an offset of 0 changes nothing";
-    file_.seek(1000, 5);
-    EXPECT_EQ(file_.tell(), 70) << "nor does an unknown type";
+    for (const int type : {0, 1, 2, 5}) {
+        file_.seek(type == 5 ? 1000 : 0, type);
+        EXPECT_EQ(file_.tell(), 70) << "an offset of 0 or an unknown type changes nothing";
+    }
 }
 
 TEST_F(BufferFileBytes, IgnoresWhatItCannotDo) {
@@ -193,50 +188,6 @@ TEST_F(BufferFileBytes, AFullDiskMovesLess) {
     }
 }
 
-TEST_F(BufferFileBytes, ReadsSingleSamplesOfItsOwnTypeOnly) {
-    struct Row {
-        int type, order;
-    };
-    file_.NrOfLinesPerImage = 2;
-    file_.NrOfPixelsPerLine = 3;
-    file_.RowPrefix = 1;
-    for (const int buffer : {0, 5, 200}) {
-        for (int type = 0; type <= 9; ++type) {
-            for (const int order : {0, 1}) {
-                file_.CellType = type;
-                file_.ByteOrder = order;
-                file_.HeaderOffset = 0;
-                test::write_text(name_, test::raster_bytes(file_));
-                file_.open(1);
-                file_.initbuffer(buffer, 0);
-                const double part = test::part_value(1, 2, 0), imaginary = test::part_value(1, 2, 1);
-                const auto expect = [&](int wanted, double value) {
-                    return type == wanted && order == 0 ? value : 0.0;
-                };
-                EXPECT_EQ(static_cast<double>(file_.readFloat(1, 2)), expect(FLOAT32, part));
-                EXPECT_EQ(file_.readDouble(1, 2), expect(FLOAT64, part));
-                EXPECT_EQ(static_cast<double>(file_.readInt(1, 2)), expect(INT32, part));
-                EXPECT_EQ(static_cast<double>(file_.readShort(1, 2)), expect(INT16, part));
-                EXPECT_EQ(static_cast<double>(file_.readFloatComplex(1, 2).imag()),
-                          expect(FLOAT_COMPLEX, imaginary));
-                EXPECT_EQ(file_.readDoubleComplex(1, 2).imag(), expect(DOUBLE_COMPLEX, imaginary));
-                EXPECT_EQ(file_.readInt(2, 0), 0) << "beyond the file";
-                EXPECT_EQ(file_.readInt(-1, 0), 0);
-                EXPECT_EQ(file_.readInt(0, 3), 0);
-                file_.close();
-            }
-        }
-    }
-    // The very first sample: its offset is 0, which seek() would ignore.
-    file_.CellType = INT16;
-    file_.ByteOrder = file_.RowPrefix = 0;
-    test::write_text(name_, test::raster_bytes(file_));
-    file_.open(1);
-    file_.initbuffer(4, 1);
-    EXPECT_EQ(file_.readShort(1, 1), static_cast<short>(test::part_value(1, 1, 0)));
-    EXPECT_EQ(file_.readShort(0, 0), static_cast<short>(test::part_value(0, 0, 0)));
-}
-
 TEST_F(BufferFileBytes, BlocksAndBytesSeeTheSameFile) {
     file_.NrOfLinesPerImage = 6;
     file_.NrOfPixelsPerLine = 5;
@@ -272,25 +223,25 @@ TEST_F(BufferFileBytes, BlocksAndBytesSeeTheSameFile) {
     EXPECT_EQ(test::read_text(name_), expected);
 }
 
-struct BadBlock {
-    int line, lines, sample, samples;
-};
 TEST_F(BufferFileBytes, BlocksOutsideTheRasterAreIgnored) {
     file_.NrOfLinesPerImage = 5;
     file_.NrOfPixelsPerLine = 10;
     file_.CellType = INT16;
-    const BadBlock rows[] = {{-1, 1, 0, 0}, {0, -1, 0, 0}, {0, 1, -1, 5},           {0, 1, 6, 5},
-                             {0, 1, 0, -3}, {4, 2, 0, 0},  {INT_MAX, INT_MAX, 0, 0}};
-    file_.open(1);
-    for (const BadBlock& row : rows) {
-        short untouched = 77;
-        file_.readbuffer(&untouched, row.line, row.lines, row.sample, row.samples);
-        EXPECT_EQ(untouched, 77) << row.line;
+    const struct {
+        int line, lines, sample, samples;
+    } rows[] = {{-1, 1, 0, 0}, {0, -1, 0, 0}, {0, 1, -1, 5},           {0, 1, 6, 5},
+                {0, 1, 0, -3}, {4, 2, 0, 0},  {INT_MAX, INT_MAX, 0, 0}};
+    for (const int mode : {1, 3}) {
+        for (const auto& row : rows) {
+            file_.open(mode);
+            short untouched = 77;
+            file_.readbuffer(&untouched, row.line, row.lines, row.sample, row.samples);
+            EXPECT_EQ(untouched, 77) << row.line;
+            if (row.line < 4) file_.writebuffer(&untouched, row.line, row.lines, row.sample, row.samples);
+            file_.close();
+            EXPECT_EQ(test::read_text(name_), content_) << row.line;
+        }
     }
-    file_.NrOfPixelsPerLine = INT_MAX;
-    short untouched = 77;
-    file_.readbuffer(&untouched, 0, 1, 0, 0);
-    EXPECT_EQ(untouched, 77);
 }
 
 }  // namespace

@@ -7,6 +7,7 @@
 #include <cstring>
 #include <limits>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "quo_base/datafile.h"
@@ -152,6 +153,31 @@ TEST_P(EveryPair, IsMovedByBlocksAsTold) {
             write_block(file, access.memory, packed.data());
             file.close();
             expect(test::read_text(name_), lists(access.block_writes, type), written, blank);
+        }
+    }
+}
+TEST_P(EveryPair, HasSingleSamplesOfItsOwnTypeInTheHostsOrder) {
+    for (const int buffer : {0, 5, 5000}) {
+        const int prefix = buffer == 5 ? 0 : kPrefix;  // the first sample may stand at 0, where seek() does not go
+        for (int type = 0; type <= INT8; ++type) {
+            BufferFile file{name_.c_str()};
+            start(file, type, bytes_of(type, GetParam(), prefix, true));
+            file.RowPrefix = prefix;
+            file.open(BufferFile::READ);
+            file.initbuffer(buffer, 0);
+            for (const auto& [line, sample] : {std::pair{1, 2}, {0, 0}, {2, 130}, {3, 0}, {-1, 0}, {0, 131}}) {
+                const bool there = GetParam() == 0 && line >= 0 && line < kLines && sample < kSamples;
+                const auto expect = [&, l = line, s = sample](auto found, int wanted, int part) {
+                    EXPECT_EQ(static_cast<double>(found),
+                              there && type == wanted ? test::part_value(l, s, part) : 0.0);
+                };
+                expect(file.readFloat(line, sample), FLOAT32, 0);
+                expect(file.readDouble(line, sample), FLOAT64, 0);
+                expect(file.readInt(line, sample), INT32, 0);
+                expect(file.readShort(line, sample), INT16, 0);
+                expect(file.readFloatComplex(line, sample).imag(), FLOAT_COMPLEX, 1);
+                expect(file.readDoubleComplex(line, sample).imag(), DOUBLE_COMPLEX, 1);
+            }
         }
     }
 }
