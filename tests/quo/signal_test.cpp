@@ -1,0 +1,164 @@
+// The verbs on signals: what they measure and make must be what was put in.
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <nlohmann/json.hpp>
+#include <numbers>
+#include <random>
+
+#include "quo_base/fft.h"
+#include "raster_folder.h"
+
+namespace {
+
+using testing::HasSubstr;
+
+class SignalVerbs : public test::RasterFolder {
+protected:
+    /** Writes a raster whose real and imaginary parts are those of value(line, sample). */
+    template <typename Value>
+    std::string make_of(const char* name, int lines, int samples, int type, Value value) {
+        std::string raster = make(name, lines, samples, type, 1);
+        std::string bytes;
+        for (int line = 0; line < lines; ++line)
+            for (int sample = 0; sample < samples; ++sample) {
+                const dcomplex z = value(line, sample);
+                test::append_part(bytes, type, z.real(), true);
+                if (type % 2 == 0) test::append_part(bytes, type, z.imag(), true);
+            }
+        test::write_text(raster, bytes);
+        return raster;
+    }
+
+    /** Noise that fills a part of the band: shares of it, and where it is centred, in cycles per sample. */
+    std::string make_noise(int lines, int samples, double range, double azimuth, double doppler) {
+        std::vector<fcomplex> noise(static_cast<std::size_t>(lines * samples));
+        std::mt19937 generator{17};
+        std::normal_distribution<float> normal;
+        const auto fills = [](int k, int n, double centre, double width) {
+            const double f = static_cast<double>(k) / n - centre;
+            return std::abs(f - std::round(f)) <= 0.5 * width;
+        };
+        for (std::size_t k = 0; k < noise.size(); ++k) {
+            const fcomplex bin{normal(generator), normal(generator)};
+            const int sample = static_cast<int>(k) % samples, line = static_cast<int>(k) / samples;
+            if (fills(sample, samples, 0.0, range) && fills(line, lines, doppler, azimuth)) noise[k] = bin;
+        }
+        EXPECT_EQ(fft_c(samples, samples, lines, lines, -2, -2, noise.data(), noise.data()), 0);
+        return make_of("noise.raw", lines, samples, FLOAT_COMPLEX, [&](int line, int sample) {
+            return dcomplex{noise[static_cast<std::size_t>(line * samples + sample)]};
+        });
+    }
+};
+
+TEST_F(SignalVerbs, SpectrumMeasuresTheBandsThatAreThere) {
+    const std::string in = make_noise(1300, 150, 0.72, 0.55, -0.31), plot = file("plot.png");
+    const auto measured = [&](std::vector<std::string> more) {
+        more.insert(more.begin(), {"spectrum", in, plot, "--json"});
+        const test::Finished finished = test::quo(more);
+        EXPECT_EQ(finished.exit_status, 0) << finished.err;
+        return nlohmann::json::parse(finished.out);
+    };
+    const auto cycles = measured({});
+    EXPECT_EQ(cycles["segments"], 2);
+    EXPECT_NEAR(cycles["range_centre"], 0.0, 0.005);
+    EXPECT_NEAR(cycles["range_bandwidth"], 0.72, 0.02);
+    EXPECT_NEAR(cycles["doppler_centroid"], -0.31, 0.005);
+    EXPECT_NEAR(cycles["azimuth_bandwidth"], 0.55, 0.01);
+    EXPECT_EQ(test::read_text(plot).substr(1, 3), "PNG");
+
+    const auto hertz = measured({"--header", test::scene_file("s1a_iw1_slc_20220104_asc")});
+    EXPECT_EQ(hertz["unit"], "Hz");
+    constexpr double kRange = 64345238.12571428, kPrf = 1717.128973878037;
+    EXPECT_DOUBLE_EQ(hertz["range_bandwidth"], cycles["range_bandwidth"].get<double>() * kRange);
+    EXPECT_DOUBLE_EQ(hertz["doppler_centroid"], cycles["doppler_centroid"].get<double>() * kPrf);
+    EXPECT_THAT(test::quo({"spectrum", in, plot}).out, HasSubstr("\nrange_bandwidth,0.7"));
+}
+
+/** A signal within a tenth of the band either way, known between its samples: periods per line and per column. */
+dcomplex signal(double x, double y) {
+    const auto tone = [](double cycles) { return std::polar(1.0, 2.0 * std::numbers::pi * cycles); };
+    return 40.0 * tone(2.0 * x) * tone(-y) + 30.0 * tone(-x + 0.1) + dcomplex{20.0, 5.0};
+}
+
+TEST_F(SignalVerbs, ResampleMeetsTheSignalBetweenItsSamples) {
+    constexpr int kLines = 26, kSamples = 31;
+    for (const int type : {FLOAT_COMPLEX, FLOAT32, DOUBLE_COMPLEX, SHORT_COMPLEX, INT16}) {
+        const double tolerance = type >= INT_COMPLEX ? 2.5 : 1e-4;  // integers are cut, then rounded
+        const std::string in = make_of("in.raw", kLines, kSamples, type, [](int line, int sample) {
+            return signal(sample / double{kSamples}, line / double{kLines});
+        });
+        for (const auto& [option, lines, samples] : {std::tuple{"--samples", kLines, 64},
+                                                     {"--samples", kLines, 12},
+                                                     {"--samples", kLines, kSamples},
+                                                     {"--lines", 77, kSamples},
+                                                     {"--lines", 11, kSamples}}) {
+            SCOPED_TRACE(testing::Message() << type << " " << option << " " << lines << " x " << samples);
+            const std::string out = file("out.raw");
+            const std::string size = std::to_string(option == std::string{"--lines"} ? lines : samples);
+            const test::Finished finished = test::quo({"resample", in, out, option, size});
+            ASSERT_EQ(finished.exit_status, 0) << finished.err;
+            BufferFile raster{out.c_str()};
+            ASSERT_EQ(raster.readhdr(), 0);
+            ASSERT_EQ(raster.NrOfLinesPerImage, lines);
+            ASSERT_EQ(raster.NrOfPixelsPerLine, samples);
+            ASSERT_EQ(raster.CellType, type);
+            raster.open(BufferFile::READ);
+            std::vector<double> real(static_cast<std::size_t>(lines * samples));
+            std::vector<dcomplex> all(real.size());
+            raster.readbuffer(real.data(), 0, lines, 0, 0);
+            raster.readbuffer(all.data(), 0, lines, 0, 0);
+            for (std::size_t k = 0; k < all.size(); ++k) {
+                const int line = static_cast<int>(k) / samples, sample = static_cast<int>(k) % samples;
+                const dcomplex z = signal(sample / double(samples), line / double(lines));
+                if (type % 2 == 0)
+                    ASSERT_LE(std::abs(all[k] - z), tolerance) << k;
+                else
+                    ASSERT_NEAR(real[k], z.real(), tolerance) << k;
+            }
+        }
+    }
+}
+
+// So many lines that columns go in strips: sixteen of the 17 at once, the second strip overlapping the first.
+TEST_F(SignalVerbs, ResampleCoversWideImagesStripByStrip) {
+    constexpr int kLines = 1 << 18;
+    const std::string in = make("in.raw", kLines, 17, INT8, 0), out = file("out.raw");
+    ASSERT_EQ(test::quo({"resample", in, out, "--lines", std::to_string(kLines)}).exit_status, 0);
+    EXPECT_TRUE(test::read_text(out) == test::read_text(in));
+}
+
+TEST_F(SignalVerbs, RefusalsNameTheCauseAndLeaveNothing) {
+    const std::string in = make("in.raw", 4, 5, INT16, 0), empty = make("empty.raw", 0, 5, INT16, 0);
+    const std::string zeros = make_sparse("zeros.raw", 4, 5, FLOAT32), out = file("out");
+    test::write_text(file("no_rates.xml"), test::header_of(test::CircularOrbit{41.3, 12.8, -12.7}, {}));
+    struct Row {
+        std::vector<std::string> arguments;
+        int exit_status;
+        const char* message;
+    };
+    const auto before = files();
+    for (const Row& row : {Row{{"spectrum", empty, out}, 1, "is empty"},
+                           {{"spectrum", zeros, out}, 1, "holds no signal"},
+                           {{"spectrum", in, out, "--header", file("no_rates.xml")}, 1, "is unknown"},
+                           {{"spectrum", in, out, "--header", file("none.xml")}, 1, "none.xml"},
+                           {{"resample", empty, out, "--samples", "9"}, 1, "is empty"},
+                           {{"resample", in, out}, 2, "--samples"},
+                           {{"resample", in, out, "--samples", "9", "--lines", "9"}, 2, "2 were given"},
+                           {{"resample", in, out, "--samples", "0"}, 2, "--samples"},
+                           {{"resample", in, out, "--lines", "99999999999"}, 2, "--lines"}}) {
+        const test::Finished finished = test::quo(row.arguments);
+        EXPECT_EQ(finished.exit_status, row.exit_status);
+        EXPECT_EQ(finished.messages().size(), 1U) << finished.err;
+        EXPECT_THAT(finished.err, HasSubstr(row.message));
+        EXPECT_EQ(files(), before);
+    }
+    setenv("QUO_FFT_ENGINE", "mkl", 1);
+    setenv("QUO_MKL_LIBRARY", "/nowhere/libmkl_rt.so", 1);
+    EXPECT_THAT(test::quo({"resample", in, out, "--samples", "9"}).err, HasSubstr("no FFT engine can be loaded"));
+    unsetenv("QUO_FFT_ENGINE");
+    unsetenv("QUO_MKL_LIBRARY");
+}
+
+}  // namespace
