@@ -104,7 +104,9 @@ TEST_F(HostileFiles, FullDisksLeaveOlderFilesWhole) {
     test::write_text(file("points.csv"), "azimuth_time_s,range_time_s\n1167930360,0.0054\n");
     const std::vector<std::vector<std::string>> jobs{
         {"convert", in, file("out.raw")},
+        {"resample", in, file("out.raw"), "--lines", "50"},
         {"quicklook", in, file("out.png")},
+        {"spectrum", in, file("out.png")},
         {"vrt", in},
         {"set", header, "SamplingConstants/prf_hz", "17"},
         {"derive", header},
