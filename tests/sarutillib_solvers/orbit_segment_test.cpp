@@ -106,9 +106,7 @@ INSTANTIATE_TEST_SUITE_P(Samples, GrPtLatLon, testing::ValuesIn(kSamples));
 
 TEST(GrPtLatLonFaults, PassOnTheStatusOfTheStartingPoint) {
     const test::Report report;
-    const CircularOrbit orbit{41.3, 12.8, -12.7};
-    const Trajectory trajectory{
-        0.0, kSpacing, sampled(5, 0.0, kSpacing, [&](double u) { return orbit.earth_fixed(u).position; })};
+    const Trajectory trajectory = segment();
     GrPtGeometry out{};
     out.look_deg = 17.3;
     EXPECT_EQ(sample(trajectory, kReference + 17.3, 80345.7, 0.0, 1.0, 0.0, out), 10);
