@@ -1,8 +1,10 @@
-# The installed package: library, headers, CMake package and pkg-config file.
+# What is installed, in three components: runtime (the library and its FFT engine), development (headers, CMake
+# package, pkg-config file), tools (the command-line tool, its manual pages and completion).
 include(CMakePackageConfigHelpers)
 
 install(TARGETS quo_base EXPORT quo_base_targets
-        LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
+        LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT development)
+set(CMAKE_INSTALL_DEFAULT_COMPONENT_NAME development)
 install(DIRECTORY "${PROJECT_SOURCE_DIR}/include/quo_base" DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
 # The headers of the trio_* family, which the library exports.
 install(FILES "${TRIO_INCLUDE_DIR}/trio.h" "${TRIO_INCLUDE_DIR}/triop.h" "${TRIO_INCLUDE_DIR}/triodef.h"
@@ -17,5 +19,9 @@ write_basic_package_version_file("${PROJECT_BINARY_DIR}/quo_base-config-version.
 install(FILES "${PROJECT_BINARY_DIR}/quo_base-config.cmake" "${PROJECT_BINARY_DIR}/quo_base-config-version.cmake"
         DESTINATION ${config_dir})
 
+file(RELATIVE_PATH to_prefix "/${CMAKE_INSTALL_LIBDIR}/pkgconfig" "/")
+string(REGEX REPLACE "/$" "" to_prefix "${to_prefix}")
 configure_file("${PROJECT_SOURCE_DIR}/cmake/quo_base.pc.in" "${PROJECT_BINARY_DIR}/quo_base.pc" @ONLY)
 install(FILES "${PROJECT_BINARY_DIR}/quo_base.pc" DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+
+include(QuoPackages)

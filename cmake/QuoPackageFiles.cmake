@@ -1,0 +1,21 @@
+# Run on the staged files before they are packed: what a Debian package holds beside the installed files.
+find_program(GZIP gzip REQUIRED)
+foreach(component IN ITEMS runtime development tools)
+    string(TOUPPER ${component} upper)
+    set(stage "${CPACK_TEMPORARY_DIRECTORY}/${component}/usr")
+    set(folder "${stage}/share/doc/${CPACK_DEBIAN_${upper}_PACKAGE_NAME}")
+    file(MAKE_DIRECTORY "${folder}")
+    file(COPY_FILE "${CMAKE_CURRENT_LIST_DIR}/debian/copyright" "${folder}/copyright")
+    string(TIMESTAMP date "%a, %d %b %Y 00:00:00 +0000" UTC)
+    file(WRITE "${folder}/changelog" "quo-base (${CPACK_PACKAGE_VERSION}) unstable; urgency=medium
+
+  * Changes are listed in CHANGELOG.md.
+
+ -- ${CPACK_PACKAGE_CONTACT}  ${date}
+")
+    file(GLOB pages "${stage}/share/man/man1/*.1")
+    execute_process(COMMAND "${GZIP}" -9nf "${folder}/changelog" ${pages} COMMAND_ERROR_IS_FATAL ANY)
+endforeach()
+# The system's loader finds the library by itself; only copies elsewhere need to be told where it is.
+file(GLOB tool "${CPACK_TEMPORARY_DIRECTORY}/tools/usr/bin/quo")
+file(RPATH_REMOVE FILE "${tool}")
