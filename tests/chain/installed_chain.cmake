@@ -1,0 +1,14 @@
+# Builds the chain's programs against an installed package, as a user would, and asks one for its help.
+function(run)
+    execute_process(COMMAND ${ARGV} RESULT_VARIABLE result OUTPUT_VARIABLE out ERROR_VARIABLE out)
+    if(result)
+        message(FATAL_ERROR "${ARGV}\n${out}")
+    endif()
+endfunction()
+
+file(REMOVE_RECURSE "${WORK}")
+run(${CMAKE_COMMAND} --install "${BUILD}" --prefix "${WORK}/prefix")
+run(${CMAKE_COMMAND} -S "${SOURCE}" -B "${WORK}/build" -G Ninja "-DCMAKE_PREFIX_PATH=${WORK}/prefix"
+    -D CMAKE_CXX_COMPILER=${CXX} "-DCMAKE_CXX_COMPILER_LAUNCHER=${LAUNCHER}")
+run(${CMAKE_COMMAND} --build "${WORK}/build" --target processor)
+run("${WORK}/build/processor" --help)
