@@ -122,8 +122,7 @@ public:
     int CreatePolys(int dc, int fr);
     int DestroyPolys();  ///< empties all lists
 
-    /** @name Selection: the value of the chosen polynomial
-     * @{ */
+    /** Selection: the value of the chosen polynomial. */
     int EvaluateDC(double rangeTime, double azimuthTime, double* value) const;
     int EvaluateFR(double rangeTime, double azimuthTime, double* value) const;
     int EvaluateSL2GR(double rangeTime, double azimuthTime, double* value) const;
@@ -136,9 +135,8 @@ public:
     double EvaluateGR2SL(double rangeTime, double azimuthTime) const;
     double EvaluateSL2THETA(double rangeTime, double azimuthTime) const;
     double EvaluateSL2PHI(double rangeTime, double azimuthTime) const;
-    /** @}
-     * @name Interpolation: the value of the blended polynomial
-     * @{ */
+
+    /** Interpolation: the value of the blended polynomial. */
     int EvaluateDCinterp(double rangeTime, double azimuthTime, double* value) const;
     int EvaluateFRinterp(double rangeTime, double azimuthTime, double* value) const;
     int EvaluateSL2GRinterp(double rangeTime, double azimuthTime, double* value) const;
@@ -151,25 +149,22 @@ public:
     double EvaluateGR2SLinterp(double rangeTime, double azimuthTime) const;
     double EvaluateSL2THETAinterp(double rangeTime, double azimuthTime) const;
     double EvaluateSL2PHIinterp(double rangeTime, double azimuthTime) const;
-    /** @}
-     * @name The 7 coefficients valid at an azimuth time
-     * @{ */
+
+    /** The 7 coefficients valid at an azimuth time. */
     int getDCpoly(double azimuthTime, double* coefficients) const;
     int getFRpoly(double azimuthTime, double* coefficients) const;
     int getSL2GRpoly(double azimuthTime, double* coefficients) const;
     int getGR2SLpoly(double azimuthTime, double* coefficients) const;
     int getSL2THETApoly(double azimuthTime, double* coefficients) const;
     int getSL2PHIpoly(double azimuthTime, double* coefficients) const;
-    /** @}
-     * @name The index of the earlier of the two polynomials around an azimuth time, 0 before, n - 1 after the list
-     * @{ */
+
+    /** The index of the earlier of the two polynomials around an azimuth time, 0 before, n - 1 after the list. */
     int getDCnum(double azimuthTime, int* index) const;
     int getFRnum(double azimuthTime, int* index) const;
     int getSL2GRnum(double azimuthTime, int* index) const;
     int getGR2SLnum(double azimuthTime, int* index) const;
     int getSL2THETAnum(double azimuthTime, int* index) const;
     int getSL2PHInum(double azimuthTime, int* index) const;
-    /** @} */
 
     /** Writes counts and polynomials, saving the file once. 0, or the first failing status, with the file as it
      * was. */
@@ -188,6 +183,7 @@ public:
     std::unique_ptr<polyGR2SL[]> GR2SL;        ///< ngr2sl ground-to-slant polynomials
     std::unique_ptr<polySL2THETA[]> SL2THETA;  ///< nsl2theta incidence angles
     std::unique_ptr<polySL2PHI[]> SL2PHI;      ///< nsl2phi look angles
+    /** Lengths of the lists. */
     int32_t ndc = 0, nfr = 0, nsl2gr = 0, ngr2sl = 0, nsl2theta = 0, nsl2phi = 0;
 
 protected:
