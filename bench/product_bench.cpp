@@ -15,33 +15,11 @@
 
 #include "quo_base/generalSAR.h"
 #include "ratio_reporter.h"
+#include "temporary_folder.h"
 
 namespace {
 
-class Folder {
-public:
-    Folder() {
-        std::string name = (std::filesystem::temp_directory_path() / "quo_bench_XXXXXX").string();
-        if (!mkdtemp(name.data())) throw std::runtime_error("no temporary folder");
-        path_ = name;
-    }
-    ~Folder() {
-        std::error_code ignored;
-        std::filesystem::remove_all(path_, ignored);
-    }
-    Folder(const Folder&) = delete;
-    Folder& operator=(const Folder&) = delete;
-
-    [[nodiscard]] std::string file(const std::string& name) const { return (path_ / name).string(); }
-
-private:
-    std::filesystem::path path_;
-};
-
-const Folder& folder() {
-    static const Folder made;
-    return made;
-}
+using bench::folder;
 
 double any_number() {
     static double value = -5123456.789;

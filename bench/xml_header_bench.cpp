@@ -19,35 +19,13 @@
 #include "quorelxmllib/header_session.h"
 #include "ratio_reporter.h"
 #include "sarutillib/number_text.h"
+#include "temporary_folder.h"
 
 namespace {
 
+using bench::folder;
+
 constexpr const char* kField = "StateVectorData/pSV_m";
-
-class Folder {
-public:
-    Folder() {
-        std::string name = (std::filesystem::temp_directory_path() / "quo_bench_XXXXXX").string();
-        if (!mkdtemp(name.data())) throw std::runtime_error("no temporary folder");
-        path_ = name;
-    }
-    ~Folder() {
-        std::error_code ignored;
-        std::filesystem::remove_all(path_, ignored);
-    }
-    Folder(const Folder&) = delete;
-    Folder& operator=(const Folder&) = delete;
-
-    [[nodiscard]] std::string file(const std::string& name) const { return (path_ / name).string(); }
-
-private:
-    std::filesystem::path path_;
-};
-
-const Folder& folder() {
-    static const Folder made;
-    return made;
-}
 
 std::vector<double> numbers(std::int64_t count) {
     std::vector<double> values(static_cast<std::size_t>(count));

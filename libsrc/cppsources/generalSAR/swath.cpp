@@ -6,6 +6,7 @@
 #include <string>
 
 #include "diagnosticslib/call_frame.h"
+#include "generalSAR/counted_array.h"
 #include "quo_base/gen_utils.h"
 #include "quo_base/profile.h"
 #include "quorelxmllib/field_table.h"
@@ -76,14 +77,8 @@ void Obj::refreshParameters() { kTable.register_all(*this); }
 
 int Obj::createBuffers() {
     quo::CallFrame frame{"SwathInfo::createBuffers", kSource};
-    quo::release_array(Swst_changes_bursts);
-    buffer_status_ = QUO_OK;
-    if (Swst_changes > kMaxSwstChanges) {
-        buffer_status_ = frame.fail(QUO_REFUSED, "More changes of the sampling window than are plausible");
-    } else if (Swst_changes > 0 &&
-               !quo::allocate_array(Swst_changes_bursts, static_cast<std::size_t>(Swst_changes))) {
-        buffer_status_ = frame.fail(QUO_NO_MEMORY, kNoMemory);
-    }
+    buffer_status_ = quo::create_counted_array(frame, Swst_changes_bursts, Swst_changes, kMaxSwstChanges,
+                                               "More changes of the sampling window than are plausible");
     if (buffer_status_ != QUO_OK) {
         destroyBuffers();
         return buffer_status_;

@@ -5,6 +5,7 @@
 
 #include "diagnosticslib/call_frame.h"
 #include "generalSAR/annex_file.h"
+#include "generalSAR/counted_array.h"
 #include "generalSAR/raster_name.h"
 #include "quo_base/gen_utils.h"
 #include "quo_base/swath.h"
@@ -41,13 +42,8 @@ void Obj::refreshParameters() { kTable.register_all(*this); }
 
 int Obj::createBuffers() {
     quo::CallFrame frame{"AntennaPattern_Obj::createBuffers", kSource};
-    quo::release_array(Pattern);
-    buffer_status_ = QUO_OK;
-    if (PatternSamples > kMaxPatternSamples) {
-        buffer_status_ = frame.fail(QUO_REFUSED, "More pattern samples than are plausible");
-    } else if (PatternSamples > 0 && !quo::allocate_array(Pattern, static_cast<std::size_t>(PatternSamples))) {
-        buffer_status_ = frame.fail(QUO_NO_MEMORY, kNoMemory);
-    }
+    buffer_status_ = quo::create_counted_array(frame, Pattern, PatternSamples, kMaxPatternSamples,
+                                               "More pattern samples than are plausible");
     if (buffer_status_ != QUO_OK) {
         destroyBuffers();
         return buffer_status_;
