@@ -43,7 +43,7 @@ protected:
 /** Doppler centroid, Hz. Keys DCpoly_azt0, DCpoly_rgt0, DCpoly. */
 class QUO_BASE_API polyDC : public poly {
 public:
-    int readpar(const char* file, const char* name);
+    int readpar(const char* file, const char* name);  ///< XML form, else the keys above; 0 or 1
     /** Older parameter-file form: DopCenPol_nCoeff tells n, DopCenRgRefTimes and DopCenAzRefSec85Times the
      * reference, DopCenRangeCoeffs the n coefficients: 5 are a pure range polynomial (c0, c1, c4, c5, c6), 7 are
      * c0 .. c6, any other number leaves the coefficients. 0, or 1 when a key is missing. */
@@ -52,7 +52,7 @@ public:
 /** Azimuth FM rate, Hz/s. Keys FRpoly_azt0, FRPoly_rgt0 (with a capital P: files depend on it), FRpoly. */
 class QUO_BASE_API polyFR : public poly {
 public:
-    int readpar(const char* file, const char* name);
+    int readpar(const char* file, const char* name);  ///< XML form, else the keys above; 0 or 1
     /** Older parameter-file forms, n coefficients; reference times are not read. n = 5: AzimuthCoeff as a pure
      * range polynomial (c0, c1, c4, c5, c6, the others 0). n = 3: AzimuthCoeff into c0, c1 and, deliberately, c3,
      * the others stay. n = 7: DopRatRangeCoeff into c0 .. c6. 0, or 1 when the key is missing or for any other n.
@@ -62,22 +62,22 @@ public:
 /** Slant to ground range. Keys SL2GRpoly_azt0, SL2GRpoly_rgt0, SL2GRpoly. */
 class QUO_BASE_API polySL2GR : public poly {
 public:
-    int readpar(const char* file, const char* name);
+    int readpar(const char* file, const char* name);  ///< XML form, else the keys above; 0 or 1
 };
 /** Ground to slant range. Keys GR2SLpoly_azt0, GR2SLpoly_rgt0, GR2SLpoly. */
 class QUO_BASE_API polyGR2SL : public poly {
 public:
-    int readpar(const char* file, const char* name);
+    int readpar(const char* file, const char* name);  ///< XML form, else the keys above; 0 or 1
 };
 /** Slant range to incidence angle, degrees. Keys SL2THETApoly_azt0, SL2THETApoly_rgt0, SL2THETApoly. */
 class QUO_BASE_API polySL2THETA : public poly {
 public:
-    int readpar(const char* file, const char* name);
+    int readpar(const char* file, const char* name);  ///< XML form, else the keys above; 0 or 1
 };
 /** Slant range to look angle, degrees. Keys SL2PHIpoly_azt0, SL2PHIpoly_rgt0, SL2PHIpoly. */
 class QUO_BASE_API polySL2PHI : public poly {
 public:
-    int readpar(const char* file, const char* name);
+    int readpar(const char* file, const char* name);  ///< XML form, else the keys above; 0 or 1
 };
 
 /** @} */
@@ -89,6 +89,7 @@ class QUO_BASE_API extended_poly : public poly {
 public:
     extended_poly();
 
+    /** The value at a range and an azimuth time; 0. */
     int EvaluatePoly(double rangeTime, double azimuthTime, double* value) const;
     int clone(extended_poly* to) const;  ///< copies coefficients and reference times
 

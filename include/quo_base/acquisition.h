@@ -96,7 +96,8 @@ public:
      * The file has a main header of 1247 and a specific header of 378 bytes; the decimal number that starts 231
      * bytes into the latter is the offset of the data set, of 171648 bytes. From its byte 171232 on it has 68
      * bytes per swath: the temperature as a float and the gains as doubles, all big-endian.
-     * @param swath  0 to 4; deliberate: any other leaves both members as they are, with 0
+     * @param annex_file  name of the file
+     * @param swath       0 to 4; deliberate: any other leaves both members as they are, with 0
      * @return 0; 1 for an offset that is no number or negative; 4 for a file that is too short; 7; 9. Members
      * change with 0 only. */
     int getDroopGain(const char* annex_file, int swath);
@@ -145,12 +146,12 @@ public:
      * stay. Returns 0. */
     int clone(QuickLook_Obj* to) const;
 
-    int QL_FirstSample = 0;
-    int QL_FirstLine = 0;
-    int QL_Samples = 0;    ///< number of samples
-    int QL_Lines = 0;      ///< number of lines
-    int QL_AzimuthML = 1;  ///< azimuth multilook factor
-    int QL_RangeML = 1;    ///< range multilook factor
+    int QL_FirstSample = 0;  ///< first sample shown, counted from 0
+    int QL_FirstLine = 0;    ///< first line shown, counted from 0
+    int QL_Samples = 0;      ///< number of samples
+    int QL_Lines = 0;        ///< number of lines
+    int QL_AzimuthML = 1;    ///< azimuth multilook factor
+    int QL_RangeML = 1;      ///< range multilook factor
 
 protected:
     void refreshParameters() override;

@@ -10,6 +10,7 @@
 #include <stddef.h>
 #include <stdint.h>
 
+/** Marks what the shared library exports. */
 #if defined(QUO_BASE_BUILD)
 #define QUO_BASE_API __attribute__((visibility("default")))
 #else
@@ -18,8 +19,11 @@
 
 #ifdef __cplusplus
 #include <complex>
+/** Begins declarations with C linkage, in C++ and in C. */
 #define QUO_BASE_C_BEGIN extern "C" {
+/** Ends what QUO_BASE_C_BEGIN began. */
 #define QUO_BASE_C_END }
+/** Marks a function that lets no exception out; empty in C. */
 #define QUO_NOEXCEPT noexcept
 /** Complex sample, single precision: real part, imaginary part, packed. */
 using fcomplex = std::complex<float>;

@@ -98,6 +98,7 @@ QUO_BASE_API int set_flg_report(int level) QUO_NOEXCEPT;
  *
  * ERROR entries take five lines, ERROR_CALL_TREE entries one without a number (though they use one up), all others
  * two. The messages of ERROR and MESSAGE entries also go to the standard error stream, as "MSG_ERROR: ...".
+ * @param message         one line of text
  * @param kind            a QuoReportKind; any other value is written as UNKNOWN
  * @param line, function, file  the caller's source position, written as they stand */
 QUO_BASE_API void quo_add_report(const char* message, int kind, int line, const char* function,

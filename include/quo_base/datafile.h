@@ -181,10 +181,12 @@ public:
     int writebuffer(const char* src);
     int writebuffer(const char* src, int width);
 
-    DataFile* File;                ///< the raster
-    int32_t FirstSample, Samples;  ///< the region's samples
-    int32_t FirstLine, Lines;      ///< the region's lines
-    int32_t MemoryType;            ///< RasterCellType of the caller's buffers
+    DataFile* File;       ///< the raster
+    int32_t FirstSample;  ///< first sample of the region, counted from 0
+    int32_t Samples;      ///< number of samples in a line of the region
+    int32_t FirstLine;    ///< first line of the region, counted from 0
+    int32_t Lines;        ///< number of lines
+    int32_t MemoryType;   ///< RasterCellType of the caller's buffers
 
 private:
     int openForReading();
@@ -205,7 +207,9 @@ public:
     /** RasterCellType by its older name. */
     using UnitType = RasterCellType;
 
+    /** A closed file without a name. */
     BufferFile();
+    /** A closed file of this name, as setFilename() takes it. */
     explicit BufferFile(const char* file_name);
     /** Closes the file as close() does. */
     ~BufferFile() override;
@@ -222,22 +226,28 @@ public:
     void setFilename(
         const char* file_name);  ///< names the raster; 512 bytes or more are no name: it becomes empty
     void getFilename(char* file_name) const;  ///< copies the name into a buffer of 512 bytes
+    /** Samples of a line. */
     void setSamples(int samples) { NrOfPixelsPerLine = samples; }
     [[nodiscard]] int getSamples() const { return NrOfPixelsPerLine; }
+    /** Lines of the raster. */
     void setLines(int lines) { NrOfLinesPerImage = lines; }
     [[nodiscard]] int getLines() const { return NrOfLinesPerImage; }
+    /** Bytes before the samples of each line. */
     void setRowPrefix(int bytes) { RowPrefix = bytes; }
     [[nodiscard]] int getRowPrefix() const { return RowPrefix; }
+    /** The samples' type, a RasterCellType. */
     void setType(int type) { CellType = type; }
     [[nodiscard]] int getType() const { return CellType; }
-    [[nodiscard]] int64_t getOffsetSize() const { return HeaderOffset; }
-    [[nodiscard]] int getFileEndian() const { return ByteOrder; }  ///< 1 big-endian, 0 little-endian
-    [[nodiscard]] int getOpType() const { return mode_; }          ///< OperationType
+    [[nodiscard]] int64_t getOffsetSize() const { return HeaderOffset; }  ///< bytes before the first line
+    [[nodiscard]] int getFileEndian() const { return ByteOrder; }         ///< 1 big-endian, 0 little-endian
+    [[nodiscard]] int getOpType() const { return mode_; }                 ///< OperationType
+    /** Bytes of a sample; as element_sizeof(). */
     [[nodiscard]] int pixelsizeof() const { return element_sizeof(); }
-    [[nodiscard]] bool is_open() const;
-    [[nodiscard]] bool is_buffered() const { return size_ > 0; }
+    [[nodiscard]] bool is_open() const;                           ///< whether open() has opened the raster
+    [[nodiscard]] bool is_buffered() const { return size_ > 0; }  ///< whether initbuffer() has given it a buffer
+    [[nodiscard]] bool exists() const;                            ///< whether the raster can be opened for reading
+    /** Whether it is open for writing. */
     [[nodiscard]] bool is_writing() const { return mode_ == WRITE || mode_ == READ_WRITE; }
-    [[nodiscard]] bool exists() const;  ///< whether the raster can be opened for reading
 
     /** Opens the raster; READ_WRITE needs it to exist. Any other mode, or a file that cannot be opened, leaves it
      * closed. A file that is open is closed first. */
@@ -271,12 +281,14 @@ public:
      * written; from `fcomplex`, DOUBLE_COMPLEX files are not written, and FLOAT64 files get two doubles for each
      * of the `samples`, where lines without room for them grow: the next one follows at once.
      * @{ */
+    /** Reads a block into a packed array. */
     void readbuffer(float* dst, int first_line, int lines, int first_sample, int samples);
     void readbuffer(double* dst, int first_line, int lines, int first_sample, int samples);
     void readbuffer(int* dst, int first_line, int lines, int first_sample, int samples);
     void readbuffer(short* dst, int first_line, int lines, int first_sample, int samples);
     void readbuffer(fcomplex* dst, int first_line, int lines, int first_sample, int samples);
     void readbuffer(dcomplex* dst, int first_line, int lines, int first_sample, int samples);
+    /** Writes a block from a packed array. */
     void writebuffer(const float* src, int first_line, int lines, int first_sample, int samples);
     void writebuffer(const double* src, int first_line, int lines, int first_sample, int samples);
     void writebuffer(const int* src, int first_line, int lines, int first_sample, int samples);
@@ -294,6 +306,7 @@ public:
      * 0 unless the file is open in mode READ or READ_WRITE, holds just this type, is little-endian and has the
      * sample. The place moves behind it.
      * @{ */
+    /** The sample of a line, both counted from 0. */
     float readFloat(int line, int sample);
     double readDouble(int line, int sample);
     int readInt(int line, int sample);

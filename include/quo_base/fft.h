@@ -69,6 +69,7 @@ QUO_BASE_API int fft_makep_c(FftPlan* plan, int n, int nfft, int m, int mfft, in
  * `in` to `out`. A normalised inverse is multiplied by its factor in single precision: 1 / nfft, divided by mfft,
  * as far as asked for.
  *
+ * @param[in]  plan made by fft_makep_c(), for other buffers of the same shape too
  * @param[in]  in   m rows of n samples; only overwritten where it is `out`
  * @param[out] out  of the same shape; samples outside the first nfft of the first mfft rows are not touched. A
  * plan without any transform leaves it untouched.
@@ -111,10 +112,10 @@ QUO_BASE_API int fft_r(int n, int nfft, int m, int mfft, int dir_rows, int dir_c
 
 /** Transforms of length L = genpow(N + M - 1, 1), forward unscaled and inverse divided by L, both in place. */
 typedef struct CztPlan {
-    FftPlan forward;
-    FftPlan inverse;
-    int N; /**< input length */
-    int M; /**< output length */
+    FftPlan forward; /**< unscaled */
+    FftPlan inverse; /**< divided by L */
+    int N;           /**< input length */
+    int M;           /**< output length */
 } CztPlan;
 
 /** Makes a chirp-z plan.
@@ -124,6 +125,7 @@ QUO_BASE_API int czt_makep_c(CztPlan* plan, int N, int M) QUO_NOEXCEPT;
 
 /** Transforms `count` vectors.
  *
+ * @param[in]  plan   made by czt_makep_c()
  * @param[in]  in     count vectors of N samples, one after the other
  * @param[out] out    count vectors of M samples; apart from `in`, or the same where M <= N
  * @param[in]  w      step of the angular frequency, radians per output sample, downwards

@@ -60,6 +60,7 @@ QUO_BASE_API void swp_any(void* buffer, int64_t length_in_bytes, int element_siz
 /** Brings a block that was read from a raster file into the host's byte order.
  *
  * @param[in,out] buffer    `count` elements of `element_size` bytes
+ * @param[in] count         number of elements; see below for 16 bytes
  * @param[in] element_size  1, 2, 4, 8 or 16
  * @param[in] swap          0: leave everything as it is
  * @return 0, or -1 for any other element size (nothing is touched; not tested when `swap` is 0).
@@ -92,13 +93,13 @@ typedef struct MjdRecord {
 
 /** A date text taken apart. */
 typedef struct DateFields {
-    int32_t year;
+    int32_t year;        /**< as written, 0 or above */
     int32_t month;       /**< 1 to 12 */
     int32_t day_of_year; /**< 1 to 366 (0 for day 0 of January, which date2str lets pass) */
-    int32_t hour;
-    int32_t minute;
-    int32_t second;  /**< whole seconds */
-    double fraction; /**< rest of the second, 0 <= fraction < 1 */
+    int32_t hour;        /**< 0 to 24 */
+    int32_t minute;      /**< 0 to 60 */
+    int32_t second;      /**< whole seconds */
+    double fraction;     /**< rest of the second, 0 <= fraction < 1 */
 } DateFields;
 
 /** Codes of date2str. All but the first are flags that combine; month and minute share one. */
@@ -123,6 +124,7 @@ QUO_BASE_API void sec852mjd(double t, MjdRecord* record_out) QUO_NOEXCEPT;
 
 /** sec85 to the long date text, cut (never rounded) to microseconds.
  *
+ * @param[in]  t         sec85
  * @param[out] text_out  28 bytes: the text and its terminating zero; unchanged unless 0 is returned
  * @return 0; or -1 with "Date should be later than 1-JAN-1985\n" on the standard error stream for a negative time,
  * and with "Date should be earlier than 1-JAN-10000\n" for one beyond four-digit years or not-a-number. */
@@ -138,6 +140,7 @@ QUO_BASE_API void mjd2ascii(MjdRecord record, char* text_out) QUO_NOEXCEPT;
  * Reading begins at the first digit among the first 40 characters, else at the 41st character whatever it is.
  * Missing trailing fields are 0. Month names are compared without regard to case.
  *
+ * @param[in]  text        ends with a NUL
  * @param[out] fields_out  unchanged unless 0 is returned
  * @return 0, DATE_NO_TEXT, or the other DateError flags combined.
  *

@@ -44,6 +44,7 @@ enum GSObject : int {
  * container lives. One container serves one thread at a time. */
 class QUO_BASE_API GeneralSAR {
 public:
+    /** Number of objects in the container. */
     static constexpr int kObjects = 14;
 
     /** Nothing present. */
@@ -80,20 +81,20 @@ public:
      * Deliberate: the presence flags stay. Returns 0. */
     int GSdestroy();
 
-    GSDataFile_Obj dataFile;
-    GSRoi_Obj roi;
-    polySAR polynomials;
-    SamplingConstants_Obj samplingConstants;
-    SAROrbitStateVectors_Obj stateVectors;
-    GeneralSAROrbit orbit;
-    SARPulse_Obj pulse;
-    AntennaPattern_Obj antennaPattern;
-    DataSetInfo_Obj dataSetInfo;
-    SensorAttitude_Obj sensorAttitude;
-    SpectralWindows_Obj spectralWindows;
-    geoCoords_Obj geoCoords;
-    SwathInfo swathInfo;
-    BufferFile bufferFile;
+    GSDataFile_Obj dataFile;                  ///< description of the product's raster, by the header's name
+    GSRoi_Obj roi;                            ///< region of interest in time
+    polySAR polynomials;                      ///< Doppler and geometry polynomials
+    SamplingConstants_Obj samplingConstants;  ///< how the acquisition was sampled
+    SAROrbitStateVectors_Obj stateVectors;    ///< the orbit's state vectors
+    GeneralSAROrbit orbit;                    ///< the orbit model, from the same vectors
+    SARPulse_Obj pulse;                       ///< the transmitted pulse
+    AntennaPattern_Obj antennaPattern;        ///< the elevation antenna pattern
+    DataSetInfo_Obj dataSetInfo;              ///< what the product is
+    SensorAttitude_Obj sensorAttitude;        ///< attitude and antenna of the sensor
+    SpectralWindows_Obj spectralWindows;      ///< the weighting that the processor applied
+    geoCoords_Obj geoCoords;                  ///< corners on the ground
+    SwathInfo swathInfo;                      ///< timing of the bursts
+    BufferFile bufferFile;                    ///< the product's raster, for reading in blocks
 
 private:
     void linkObjects();

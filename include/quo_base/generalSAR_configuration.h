@@ -25,6 +25,7 @@ class GeneralSAR;
 /** The parameters that all processors share. Values missing in a file stay as they are. */
 class QUO_BASE_API GeneralSAR_BaseConfiguration {
 public:
+    /** Number of shared parameters. */
     static constexpr int kSharedParameters = 5;
 
     GeneralSAR_BaseConfiguration() = default;
@@ -84,6 +85,7 @@ public:
     [[nodiscard]] virtual const char* meaning(int index) const = 0;
 
 protected:
+    /** For the record classes: takes the class name, a literal. */
     explicit GeneralSAR_ConfigurationRecord(const char* section) : section_{section} {}
 
 private:
@@ -140,6 +142,7 @@ class QUO_BASE_API generalProcessingConf : public GeneralSAR_ConfigurationRecord
     QUO_CONFIGURATION_RECORD(generalProcessingConf)
     /** A record read from a file; throws as readpar(). */
     generalProcessingConf(const char* file, int channel);
+
     int32_t Flag_incore = 0, Flag_ortog = 1, Flag_swstal = 1, Flag_ext = 1, Flag_rangefoc = 1, Flag_rgpatt = 1;
     int32_t Flag_azimuthfoc = 1, Flag_dcest = 1, Remove_interferences = 0, Azblk = 1, EraseTemp = 1;
 };
@@ -230,9 +233,9 @@ class QUO_BASE_API GeneralSAR_configuration {
 public:
     GeneralSAR_configuration();
 
-    int GSenable(GScObject object);   ///< 0; 1 for a value that selects nothing
-    int GSdisable(GScObject object);  ///< 0; 1 for a value that selects nothing
-    [[nodiscard]] bool GSexists(GScObject object) const;
+    int GSenable(GScObject object);                       ///< 0; 1 for a value that selects nothing
+    int GSdisable(GScObject object);                      ///< 0; 1 for a value that selects nothing
+    [[nodiscard]] bool GSexists(GScObject object) const;  ///< whether the record is enabled
     /** The record, enabled or not; null for a value that selects nothing. */
     [[nodiscard]] GeneralSAR_BaseConfiguration* GSget(GScObject object);
 
@@ -245,13 +248,13 @@ public:
     /** Clones each enabled record into the other container and enables it there. Returns 0. */
     int GSclone(GeneralSAR_configuration* to) const;
 
-    AzimuthConf azimuth;
-    DCestConf doppler;
-    ExtractorConf extractor;
-    generalProcessingConf processing;
-    FinefitestConf fine_fit;
-    EnvisatCalibrationFactors calibration;
-    DemExtractorConf dem;
+    AzimuthConf azimuth;                    ///< gscAzimuthConf
+    DCestConf doppler;                      ///< gscDCestConf
+    ExtractorConf extractor;                ///< gscExtractorConf
+    generalProcessingConf processing;       ///< gscGeneralProcessingConf
+    FinefitestConf fine_fit;                ///< gscFinefitestConf
+    EnvisatCalibrationFactors calibration;  ///< gscEnvisatCalibrationFactors
+    DemExtractorConf dem;                   ///< without selector: neither read nor written
 
 private:
     static constexpr int kSelectors = 6;
@@ -261,14 +264,15 @@ private:
 
 /** Something in a configuration file that does not fit its record. */
 struct ConfigurationFinding {
-    std::string section, name;  ///< the name is empty where the whole section is meant
-    std::string reason;         ///< continues the name: "is missing", "17 lies above 1"
+    std::string section;  ///< section of the record, or one that no record has
+    std::string name;     ///< name of the element; empty where the whole section is meant
+    std::string reason;   ///< continues the name: "is missing", "17 lies above 1"
 };
 
 /** What a configuration file holds. */
 struct ConfigurationReview {
-    std::vector<std::string> records;  ///< the records that are there, by name, in the order of the file
-    std::vector<ConfigurationFinding> findings;
+    std::vector<std::string> records;            ///< the records that are there, by name, in the order of the file
+    std::vector<ConfigurationFinding> findings;  ///< what does not fit
 };
 
 /** Compares a channel of a configuration file with the records that it holds. Findings are sections and elements
@@ -277,7 +281,9 @@ struct ConfigurationReview {
  * only what is missing. A section "generalProcessingConf" with nothing but shared parameters is not the record of
  * that name.
  *
- * @param[out] review  replaced, also on failure
+ * @param[in]  file     name of the configuration file
+ * @param[in]  channel  number of the channel, usually 1
+ * @param[out] review   replaced, also on failure
  * @return 0, with or without findings; 1 when the file is missing or no header document; 7. */
 QUO_BASE_API int reviewConfiguration(const char* file, int channel, ConfigurationReview& review);
 

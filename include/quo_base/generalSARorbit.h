@@ -99,6 +99,7 @@ private:
 
 /** What SVCheck() found wrong with the state vectors. */
 struct SVFinding {
+    /** What can be wrong. */
     enum Problem : std::uint8_t {
         kTooFew,        ///< fewer than five vectors; size is their number
         kTimes,         ///< first time or spacing not finite, or spacing not positive; size is the spacing
@@ -109,10 +110,10 @@ struct SVFinding {
         kPositionStep,  ///< the position is off the curve through its neighbours; size is the distance, m
         kVelocity,      ///< the velocity is not the positions' derivative; size is the difference, m/s
     };
-    Problem problem;
+    Problem problem;     ///< what is wrong
     std::int32_t index;  ///< number of the vector, from 0; -1 for the list as a whole
-    double size;
-    char text[120];  ///< the finding in words
+    double size;         ///< how far it is off, as told by the problem
+    char text[120];      ///< the finding in words
 };
 
 /** The orbit model: a degree-4 polynomial through every run of five state vectors, and geolocation on it.
@@ -224,8 +225,11 @@ public:
      *
      * The line is the one to the zero-Doppler point of (t, range), turned by `squint` degrees towards the
      * velocity: cos(squint) (line of sight) + sin(squint) (unit velocity).
-     * @param[out] xyz   ground point
-     * @param[out] time  two-way range time along the squinted line, s
+     * @param[in]  t       azimuth time, s since 1985
+     * @param[in]  range   two-way range time of the zero-Doppler point, s
+     * @param[in]  squint  degrees, positive forwards
+     * @param[out] xyz     ground point
+     * @param[out] time    two-way range time along the squinted line, s
      * @return 0; 10 also where the line passes the Earth by. */
     int sat2earthSquinted(double t, double range, double squint, double* xyz, double* time) noexcept;
 

@@ -26,6 +26,7 @@ public:
     using GeneralSAR_Base::writehdr;
     int clone(geoCoords_Obj* to) const;  ///< copies spacing and points; 0
 
+    /** The points of the grid, each in its own section. */
     geopoint NorthWest, NorthEast, SouthWest, SouthEast, Center;
     double EastingGridSize = -999.0;   ///< spacing of the grid to the east, m
     double NorthingGridSize = -999.0;  ///< spacing of the grid to the north, m
@@ -42,7 +43,7 @@ public:
     using GeneralSAR_Base::writehdr;
     int clone(GSRoi_Obj* to) const;  ///< copies the region; 0
 
-    ROI_Obj Roi;
+    ROI_Obj Roi;  ///< the region
 };
 
 /** The description of a product's raster. The raster is named like the product's header less its last four
@@ -58,7 +59,7 @@ public:
     using GeneralSAR_Base::writehdr;
     int clone(GSDataFile_Obj* to) const;  ///< copies name and description, opens nothing; 0 or a failing close
 
-    DataFile File;
+    DataFile File;  ///< name and description; opened by the caller, if at all
 };
 
 #endif

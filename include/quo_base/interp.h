@@ -55,7 +55,10 @@ public:
      * has no next one and is held. Where the growth is no multiple, output beyond f times the input is left as it
      * is.
      *
-     * @param[out] out  ny_out rows of nx_out, apart from `in`
+     * @param[in]  in              ny_in rows of nx_in
+     * @param[in]  nx_in, ny_in    size of the image
+     * @param[in]  nx_out, ny_out  size that it gets
+     * @param[out] out             ny_out rows of nx_out, apart from `in`
      * @return 0, also when nothing grows (nothing is written then); 1 for null pointers, a size below 1, an image
      * beyond any memory, or when one axis grows and the other changes too */
     int interp_lin(const fcomplex* in, int nx_in, int ny_in, int nx_out, int ny_out, fcomplex* out);
@@ -92,11 +95,15 @@ class QUO_BASE_API interp2D {
 public:
     /** At `count` positions, out[k] being the image at (x[k], y[k]).
      *
-     * @param[in]  in  ny rows of nx samples
-     * @param[out] out apart from `in`; unchanged unless 0 is returned
+     * @param[in]  in       ny rows of nx samples
+     * @param[in]  nx, ny   size of the image
+     * @param[in]  x, y     positions, samples and rows from 0
+     * @param[in]  count    number of positions
+     * @param[out] out      apart from `in`; unchanged unless 0 is returned
      * @return 0; 1 for null pointers, nx, ny below 1 or an image beyond any memory, a negative count or lowpass
      * outside 1..64; 7 without memory */
     int interp2(const fcomplex* in, int nx, int ny, const double* x, const double* y, int count, fcomplex* out);
+    /** The same in a narrowed band; `lowpass` from 1 to 64. */
     int interp2(const fcomplex* in, int nx, int ny, const double* x, const double* y, int count, fcomplex* out,
                 int lowpass);
 
@@ -131,7 +138,8 @@ public:
 
     /** Multiplies every row by exp(-i phase): a signal of this phase becomes constant.
      *
-     * @param[in,out] data  ny rows of nx samples; unchanged unless 0 is returned
+     * @param[in]     nx, ny  size of the image
+     * @param[in,out] data    ny rows of nx samples; unchanged unless 0 is returned
      * @return 0; 1 for a null pointer, nx or ny below 1; 7 without memory */
     int applyDemodPhase(fcomplex* data, int nx, int ny) const;
     /** Multiplies every row by exp(+i phase), which undoes applyDemodPhase(). */

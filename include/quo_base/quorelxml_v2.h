@@ -132,11 +132,15 @@ protected:
      * characters. Lists are read with formats of their own, whose length does not grow with the list. */
     int setFormat(int count, int type);
 
+    /** What the object holds: the format that setFormat() built, the file's name (empty without one), and mirrors
+     * of the document's description and number of channels. */
     const std::string& format() const noexcept { return format_; }
     const std::string& fileName() const noexcept { return file_name_; }
     const std::string& description() const noexcept { return description_; }
     std::int32_t numberOfChannels() const noexcept { return number_of_channels_; }
+    /** Whether there is a document in memory. */
     bool loaded() const noexcept { return document_ != nullptr; }
+    /** Takes over the name of the file, nothing else. 0; 1 for one that does not fit, with no name left; 7. */
     int storeFileName(const char* file_name) noexcept;
     /** Inserts a processing instruction before the root element, unless something stands there already. */
     int insertInstruction(const char* name, const char* content) noexcept;
@@ -172,23 +176,25 @@ public:
 /** One member of a header object: where it lives and how it appears in a header file. */
 class QUO_BASE_API parElement {
 public:
+    /** Type of the values; those of typeNone are left out. */
     enum ParameterType { typeDouble = 0, typeFloat = 1, typeInt = 2, typeString = 3, typeNone = 4 };
 
     /** Room of a text member, bytes, the final NUL included. */
     static constexpr std::size_t kTextRoom = 512;
 
-    char name[64] = "";  ///< element name in the object's section
-    ParameterType type = typeNone;
-    std::int32_t count = 0;   ///< number of values; 0: absent for now, skipped by reading and writing
-    void* pointer = nullptr;  ///< the values: first number, text, or array of texts (char**); not owned
-    double minimum = 0.0;     ///< bounds, not enforced by reading and writing; 0 and 0: unbounded
-    double maximum = 0.0;
-    bool mandatory = false;        ///< a failed read of this element fails the whole read
-    bool scalar = false;           ///< the first registration had count 1
-    bool registered = false;       ///< set after the first registration; `scalar` is fixed from then on
-    std::size_t room = kTextRoom;  ///< room of each text
-    bool text_array = false;       ///< `pointer` is an array of texts, whatever the count
+    char name[64] = "";             ///< element name in the object's section
+    ParameterType type = typeNone;  ///< type of the values
+    std::int32_t count = 0;         ///< number of values; 0: absent for now, skipped by reading and writing
+    void* pointer = nullptr;        ///< the values: first number, text, or array of texts (char**); not owned
+    double minimum = 0.0;           ///< lower bound, not enforced by reading and writing; 0 and 0: unbounded
+    double maximum = 0.0;           ///< upper bound, likewise
+    bool mandatory = false;         ///< a failed read of this element fails the whole read
+    bool scalar = false;            ///< the first registration had count 1
+    bool registered = false;        ///< set after the first registration; `scalar` is fixed from then on
+    std::size_t room = kTextRoom;   ///< room of each text
+    bool text_array = false;        ///< `pointer` is an array of texts, whatever the count
 
+    /** Describes the element anew. Before the first registration a count of 1 makes it a scalar. Returns 0. */
     int setElement(const char* element_name, void* values, ParameterType value_type, std::int32_t value_count,
                    double lowest, double highest, bool is_mandatory) noexcept;
 };

@@ -60,7 +60,8 @@ public:
 
     /** What two regions share, on a's grid intervals (those of b are ignored).
      *
-     * @param[out] out  may be a or b. Where nothing is shared it is empty, with start and length as computed (the
+     * @param[in]  a, b  the regions
+     * @param[out] out   may be a or b. Where nothing is shared it is empty, with start and length as computed (the
      *                  lengths are then 0 or negative).
      * @return 0; 1 for a null pointer */
     static int IntersectROI(const ROI_Obj* a, const ROI_Obj* b, ROI_Obj* out);
@@ -114,10 +115,10 @@ public:
      * intervals, lengths and counts of `out` are set; `out` may be `image`. Returns 0, or 1 for a null pointer. */
     int GetROI(const ROI_Obj* image, ROI_Obj* out) const;
 
-    int FirstSample = 0;
-    int FirstLine = 0;
-    int Samples = 0;  ///< number of samples
-    int Lines = 0;    ///< number of lines
+    int FirstSample = 0;  ///< counted from 0
+    int FirstLine = 0;    ///< counted from 0
+    int Samples = 0;      ///< number of samples
+    int Lines = 0;        ///< number of lines
 
 protected:
     void refreshParameters() override;

@@ -108,6 +108,7 @@ public:
      * bytes into the latter is the offset of the data set. That is kAnnexSwaths * kAnnexPolarizations records, the
      * polarizations of a swath one after the other. A record is big-endian floats: start angle and step in
      * degrees, then kAnnexSamples two-way gains.
+     * @param annex_file    name of the file
      * @param swath         0 to 7, as DataSetInfo_Obj::getISNbr numbers them
      * @param polarization  0 to 3, as DataSetInfo_Obj::getPolarizationNbr numbers them
      * @return 0, with the angles, PatternSamples and Pattern set; 1 for another swath or polarization or an offset
