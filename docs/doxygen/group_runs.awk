@@ -1,6 +1,6 @@
-# A comment in our headers holds for all that is declared without a gap after it. This filter tells Doxygen so: it puts
-# such a run into a group, whose members share the documentation of the first, and splits declarations of several
-# members. Lines keep their numbers. The members of the configuration records share a sentence that stands here.
+# A comment in our headers holds for all that is declared without a gap after it. This filter tells Doxygen so: it
+# puts such a run into a group, whose members share the documentation of the first, and splits declarations of
+# several members. Lines keep their numbers. The members of the configuration records share a sentence of its own.
 function hold(line) { lines[++held] = line }
 function flush_run(    i, group) {
     group = run && declarations > 1
@@ -13,8 +13,8 @@ function flush_run(    i, group) {
     held = run = declarations = end_of_comment = 0
 }
 function show(line) { flush_run(); print before line; before = "" }
-# "int a = 1, b = 2;  ///< text" becomes "int a = 1;  ///< text" and "int b = 2;  ///< text", on one line where there
-# is no text. Names inside (), {} or <> are no further members.
+# "int a = 1, b = 2;  ///< text" becomes two declarations with the text behind each. Commas inside (), {} or <>
+# separate no members.
 function split_members(line,    text, names, type, indent, count, parts, i, out) {
     text = ""
     if (match(line, /  *\/\/\/<.*$/)) {
@@ -47,7 +47,9 @@ function split_at_commas(line, parts,    i, c, depth, count) {
     }
     return count
 }
-function is_member() { return /^    ((static|constexpr|const) +)*[A-Za-z_:0-9]+ [A-Za-z_0-9]+[^()]*, [^()]*; *(\/\/\/<.*)?$/ }
+function is_member() {
+    return /^    ((static|constexpr|const) +)*[A-Za-z_:0-9]+ [A-Za-z_0-9]+[^()]*, [^()]*; *(\/\/\/<.*)?$/
+}
 
 /^ *\/\*\*/ { flush_run(); in_comment = 1; run = !/@file|@name|@}/ }
 in_comment {

@@ -1,1 +1,3 @@
-s/\[([^]]*)\]\(#[^)]*\)/\1/g
+# Doxygen follows links to whole pages that it shows, not those into a page, to a folder or to a source.
+s/(\]\([A-Za-z_/.]+\.md)#[^)]*\)/\1)/g
+s/\[([^]]*)\]\((#[^)]*|(\.\.\/)*[^).:]*|(\.\.\/)?examples\/[^)]*)\)/\1/g
