@@ -16,7 +16,7 @@ namespace quo {
 namespace {
 
 // Large enough to make system calls rare, small enough to stay in the second-level cache while it is converted.
-constexpr std::int64_t kChunk = std::int64_t{1} << 18;
+constexpr std::int64_t kChunk = std::int64_t{1} << 19;
 // Pieces nearer to each other than this are read in one transfer with what lies between.
 constexpr std::int64_t kSmallGap = 4096;
 
