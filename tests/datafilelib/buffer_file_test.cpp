@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <climits>
 #include <cstdint>
 #include <optional>
 #include <random>
@@ -221,27 +220,6 @@ TEST_F(BufferFileBytes, BlocksAndBytesSeeTheSameFile) {
     expected.replace(4 + 48, 1, "z");
     file_.close();
     EXPECT_EQ(test::read_text(name_), expected);
-}
-
-TEST_F(BufferFileBytes, BlocksOutsideTheRasterAreIgnored) {
-    file_.NrOfLinesPerImage = 5;
-    file_.NrOfPixelsPerLine = 10;
-    file_.CellType = INT16;
-    const struct {
-        int line, lines, sample, samples;
-    } rows[] = {{-1, 1, 0, 0}, {0, -1, 0, 0}, {0, 1, -1, 5},           {0, 1, 6, 5},
-                {0, 1, 0, -3}, {4, 2, 0, 0},  {INT_MAX, INT_MAX, 0, 0}};
-    for (const int mode : {1, 3}) {
-        for (const auto& row : rows) {
-            file_.open(mode);
-            short untouched = 77;
-            file_.readbuffer(&untouched, row.line, row.lines, row.sample, row.samples);
-            EXPECT_EQ(untouched, 77) << row.line;
-            if (row.line < 4) file_.writebuffer(&untouched, row.line, row.lines, row.sample, row.samples);
-            file_.close();
-            EXPECT_EQ(test::read_text(name_), content_) << row.line;
-        }
-    }
 }
 
 }  // namespace

@@ -1,12 +1,12 @@
-// Every pair of cell type and memory type, in both byte orders, against the rules told one by one.
+// Every pair of cell type and memory type, in rasters of different layouts, against the rules told one by one.
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <cmath>
 #include <cstdint>
 #include <cstring>
 #include <limits>
 #include <string>
+#include <type_traits>
 #include <utility>
 #include <vector>
 
@@ -16,21 +16,55 @@
 
 namespace {
 
-constexpr int kLines = 3, kSamples = 131, kPrefix = 3;  // odd, and more than a few vectors
+/** A rectangle of the test raster, whose lines are longer than a few vectors, and odd. */
+struct Cut {
+    int line, lines, sample, samples;
+    [[nodiscard]] bool holds(int l, int s) const {
+        return l >= line && l < line + lines && s >= sample && s < sample + samples;
+    }
+};
+constexpr int kLines = 5, kSamples = 67, kWidth = 58;
+constexpr Cut kAll{0, kLines, 0, kSamples}, kPart{1, 3, 6, 53}, kNothing{};
+
+struct Layout {
+    const char* name;
+    int order, prefix;
+    int64_t offset;
+    int buffer;  // of a DataFile
+};
+constexpr Layout kLayouts[] = {{"LittleEndian", 0, 0, 0, 0},
+                               {"BigEndianPrefix", 1, 3, 0, 0},
+                               {"LittleEndianLargePrefix", 0, 6000, 7, 0},
+                               {"BigEndianHeaderBuffered", 1, 17, 101, 64}};
 
 bool complex_type(int type) { return type % 2 == 0; }
 
-/** The test raster with samples of a type; of real values where `pairs` is false. */
-std::string bytes_of(int type, int order, int prefix, bool pairs) {
-    std::string text;
+void append_sample(std::string& text, int type, int line, int sample, bool pairs, bool big) {
+    for (int part = 0; part <= (complex_type(type) ? 1 : 0); ++part)
+        test::append_part(text, type, part == 1 && !pairs ? 0.0 : test::part_value(line, sample, part), big);
+}
+/** A raster with the samples of a cut, of real values where `pairs` is false, and dots elsewhere. */
+std::string raster(int type, const Layout& layout, const Cut& cut, bool pairs) {
+    std::string text(static_cast<std::size_t>(layout.offset), '.'), dots;
+    append_sample(dots, type, 0, 0, true, false);
+    dots.assign(dots.size(), '.');
     for (int line = 0; line < kLines; ++line) {
-        text.append(static_cast<std::size_t>(prefix), '.');
+        text.append(static_cast<std::size_t>(layout.prefix), '.');
         for (int sample = 0; sample < kSamples; ++sample) {
-            for (int part = 0; part <= (complex_type(type) ? 1 : 0); ++part) {
-                const double value = part == 1 && !pairs ? 0.0 : test::part_value(line, sample, part);
-                test::append_part(text, type, value, order == 1);
-            }
+            if (cut.holds(line, sample)) append_sample(text, type, line, sample, pairs, layout.order == 1);
+            if (!cut.holds(line, sample)) text += dots;
         }
+    }
+    return text;
+}
+/** The samples of a cut as a caller holds them, in rows of `width` samples. */
+std::string packed(int type, const Cut& cut, bool pairs, int width) {
+    std::string text;
+    for (int line = cut.line; line < cut.line + cut.lines; ++line) {
+        const std::size_t start = text.size();
+        for (int i = 0; i < cut.samples; ++i) append_sample(text, type, line, cut.sample + i, pairs, false);
+        const std::size_t size = (text.size() - start) / static_cast<std::size_t>(cut.samples);
+        text.append(size * static_cast<std::size_t>(width - cut.samples), 'U');
     }
     return text;
 }
@@ -54,15 +88,15 @@ constexpr Access kAccesses[] = {
 };
 bool lists(const char* types, int type) { return std::strchr(types, '0' + type) != nullptr; }
 
-/** A raster file of one cell type and byte order. */
-class EveryPair : public testing::TestWithParam<int> {
+class EveryPair : public testing::TestWithParam<Layout> {
 protected:
-    void start(RasterDescription& raster, int type, const std::string& content) {
-        raster.NrOfLinesPerImage = kLines;
-        raster.NrOfPixelsPerLine = kSamples;
-        raster.CellType = type;
-        raster.ByteOrder = GetParam();
-        raster.RowPrefix = kPrefix;
+    void start(RasterDescription& description, int type, const std::string& content) {
+        description.NrOfLinesPerImage = kLines;
+        description.NrOfPixelsPerLine = kSamples;
+        description.CellType = type;
+        description.ByteOrder = GetParam().order;
+        description.RowPrefix = GetParam().prefix;
+        description.HeaderOffset = GetParam().offset;
         test::write_text(name_, content);
     }
     /** What is expected of a reader or writer that converts, or does not. */
@@ -80,93 +114,114 @@ TEST_P(EveryPair, IsMovedByRegionsAsTold) {
         for (int type = 0; type <= INT8; ++type) {
             SCOPED_TRACE(testing::Message() << "file " << type << ", memory " << access.memory);
             const bool refused = type > INT16 || access.memory > INT16, pairs = complex_type(access.memory);
-            const std::string packed = bytes_of(access.memory, 0, 0, complex_type(type));
-            std::string memory(packed.size(), 'U');
+            const std::string wanted = packed(access.memory, kPart, complex_type(type), kWidth);
+            std::string memory(wanted.size(), 'U');
             DataFile file;
             file.setFilename(name_.c_str());
-            start(file, type, bytes_of(type, GetParam(), kPrefix, true));
-            BufferIO region{&file, 0, kSamples, 0, kLines, access.memory};
-            EXPECT_EQ(region.readbuffer(memory.data(), kSamples), refused ? 1 : 0);
-            expect(memory, lists(access.region_reads, type), packed, std::string(packed.size(), 'U'));
+            file.BufferSize = GetParam().buffer;
+            const std::string content = raster(type, GetParam(), kAll, true);
+            start(file, type, content);
+            BufferIO region{&file, kPart.sample, kPart.samples, kPart.line, kPart.lines, access.memory};
+            EXPECT_EQ(region.readbuffer(memory.data(), kWidth), refused ? 1 : 0);
+            expect(memory, lists(access.region_reads, type), wanted, std::string(wanted.size(), 'U'));
+            if (!refused) {
+                const auto line = (static_cast<int64_t>(content.size()) - file.HeaderOffset) / kLines;
+                EXPECT_EQ(file.tell(), file.HeaderOffset + 4 * line) << "the line after";
+            }
             file.close();
 
-            const std::string written = bytes_of(type, GetParam(), kPrefix, pairs), blank(written.size(), '.');
+            const std::string blank = raster(type, GetParam(), kNothing, true);
             start(file, type, blank);
-            ASSERT_EQ(file.open(2), 0);
+            file.BufferSize = GetParam().buffer;
+            ASSERT_EQ(file.open(3), 0);
             const bool writes = lists(access.region_writes, type);
-            EXPECT_EQ(region.writebuffer(bytes_of(access.memory, 0, 0, true).data()), writes ? 0 : 1);
+            EXPECT_EQ(region.writebuffer(packed(access.memory, kPart, true, kWidth).data(), kWidth),
+                      writes ? 0 : 1);
             file.close();
-            expect(test::read_text(name_), writes, written, blank);
+            expect(test::read_text(name_), writes, raster(type, GetParam(), kPart, pairs), blank);
         }
     }
 }
 
-/** readbuffer() of a memory type; false for one that has none. */
-bool read_block(BufferFile& file, int memory, char* to) {
-    const auto read = [&](auto* typed) { return file.readbuffer(typed, 0, kLines, 0, 0), true; };
-    switch (memory) {
-        case FLOAT_COMPLEX:
-            return read(reinterpret_cast<fcomplex*>(to));
-        case FLOAT32:
-            return read(reinterpret_cast<float*>(to));
-        case DOUBLE_COMPLEX:
-            return read(reinterpret_cast<dcomplex*>(to));
-        case FLOAT64:
-            return read(reinterpret_cast<double*>(to));
-        case INT32:
-            return read(reinterpret_cast<int*>(to));
-        case INT16:
-            return read(reinterpret_cast<short*>(to));
-        default:
-            return false;
-    }
-}
-void write_block(BufferFile& file, int memory, const char* from) {
-    const auto write = [&](const auto* typed) { file.writebuffer(typed, 0, kLines, 0, kSamples); };
-    if (memory == FLOAT_COMPLEX) write(reinterpret_cast<const fcomplex*>(from));
-    if (memory == FLOAT32) write(reinterpret_cast<const float*>(from));
-    if (memory == DOUBLE_COMPLEX) write(reinterpret_cast<const dcomplex*>(from));
-    if (memory == FLOAT64) write(reinterpret_cast<const double*>(from));
-    if (memory == INT32) write(reinterpret_cast<const int*>(from));
-    if (memory == INT16) write(reinterpret_cast<const short*>(from));
+/** Moves bytes as values of the memory type, where an accessor has it. */
+template <typename Bytes, typename Move>
+void by_type(int memory, Bytes* bytes, Move move) {
+    const auto as = [&](int type, auto value) {
+        using T = std::conditional_t<std::is_const_v<Bytes>, const decltype(value), decltype(value)>;
+        if (type == memory) move(reinterpret_cast<T*>(bytes));
+    };
+    as(FLOAT_COMPLEX, fcomplex{});
+    as(FLOAT32, float{});
+    as(DOUBLE_COMPLEX, dcomplex{});
+    as(FLOAT64, double{});
+    as(INT32, int{});
+    as(INT16, short{});
 }
 
 TEST_P(EveryPair, IsMovedByBlocksAsTold) {
     for (const Access& access : kAccesses) {
         for (int type = 0; type <= INT8; ++type) {
             SCOPED_TRACE(testing::Message() << "file " << type << ", memory " << access.memory);
-            const std::string packed = bytes_of(access.memory, 0, 0, true), untouched(packed.size(), 'U');
-            std::string memory = untouched;
             BufferFile file{name_.c_str()};
-            start(file, type, bytes_of(type, GetParam(), kPrefix, true));
-            file.open(BufferFile::READ);
-            if (!read_block(file, access.memory, memory.data())) continue;
-            expect(memory, lists(access.block_reads, type), packed, untouched);
-            memory = untouched;
-            file.open(BufferFile::READ_WRITE);
-            read_block(file, access.memory, memory.data());
-            expect(memory, lists(access.block_reads, type), packed, untouched);
-
+            start(file, type, raster(type, GetParam(), kAll, true));
+            for (const Cut& cut : {kPart, kAll}) {
+                const std::string wanted = packed(access.memory, cut, true, cut.samples);
+                const std::string untouched(wanted.size(), 'U');
+                std::string memory = untouched;
+                file.open(&cut == &kPart ? BufferFile::READ : BufferFile::READ_WRITE);
+                const int samples = cut.samples == kSamples ? 0 : cut.samples;
+                by_type(access.memory, memory.data(),
+                        [&](auto* to) { file.readbuffer(to, cut.line, cut.lines, cut.sample, samples); });
+                expect(memory, lists(access.block_reads, type), wanted, untouched);
+            }
             if (access.memory == FLOAT_COMPLEX && type == FLOAT64) continue;
-            const std::string written = bytes_of(type, GetParam(), kPrefix, true), blank(written.size(), '.');
+            const std::string blank = raster(type, GetParam(), kNothing, true);
+            const std::string source = packed(access.memory, kPart, true, kPart.samples);
             start(file, type, blank);
-            write_block(file, access.memory, packed.data());
+            by_type(access.memory, source.data(), [&](const auto* from) {
+                file.writebuffer(from, kPart.line, kPart.lines, kPart.sample, kPart.samples);
+            });
             file.close();
-            expect(test::read_text(name_), lists(access.block_writes, type), written, blank);
+            expect(test::read_text(name_), lists(access.block_writes, type), raster(type, GetParam(), kPart, true),
+                   blank);
         }
     }
 }
+
+// Letters that tell their line, in a raster of one cell type: the prefixes of three lines are read and replaced.
+TEST_P(EveryPair, LeavesPrefixesToTheirOwnAccess) {
+    const auto prefix = static_cast<std::size_t>(GetParam().prefix);
+    std::string found(3 * prefix, ' '), wanted;
+    const std::string marks(3 * prefix, '#');
+    DataFile file;
+    file.setFilename(name_.c_str());
+    file.BufferSize = GetParam().buffer;
+    start(file, INT16, "");
+    std::string content = test::raster_bytes(file);
+    test::write_text(name_, content);
+    ASSERT_EQ(file.open(3), 0);
+    BufferIO region{&file, kPart.sample, kPart.samples, kPart.line, kPart.lines, INT16};
+    ASSERT_EQ(region.readprefix(found.data()), 0);
+    ASSERT_EQ(region.writeprefix(marks.data()), 0);
+    ASSERT_EQ(file.close(), 0);
+    for (std::size_t line = 1; line < 4; ++line) {
+        const std::size_t at = static_cast<std::size_t>(file.HeaderOffset) + line * (2 * kSamples + prefix);
+        wanted += content.substr(at, prefix);
+        content.replace(at, prefix, prefix, '#');
+    }
+    EXPECT_EQ(found, wanted);
+    EXPECT_EQ(test::read_text(name_), content);
+}
+
 TEST_P(EveryPair, HasSingleSamplesOfItsOwnTypeInTheHostsOrder) {
-    for (const int buffer : {0, 5, 5000}) {
-        const int prefix = buffer == 5 ? 0 : kPrefix;  // the first sample may stand at 0, where seek() does not go
+    for (const int buffer : {0, 5, 9000}) {
         for (int type = 0; type <= INT8; ++type) {
             BufferFile file{name_.c_str()};
-            start(file, type, bytes_of(type, GetParam(), prefix, true));
-            file.RowPrefix = prefix;
+            start(file, type, raster(type, GetParam(), kAll, true));
             file.open(BufferFile::READ);
             file.initbuffer(buffer, 0);
-            for (const auto& [line, sample] : {std::pair{1, 2}, {0, 0}, {2, 130}, {3, 0}, {-1, 0}, {0, 131}}) {
-                const bool there = GetParam() == 0 && line >= 0 && line < kLines && sample < kSamples;
+            for (const auto& [line, sample] : {std::pair{1, 2}, {0, 0}, {4, 66}, {5, 0}, {-1, 0}, {0, 67}}) {
+                const bool there = GetParam().order == 0 && kAll.holds(line, sample);
                 const auto expect = [&, l = line, s = sample](auto found, int wanted, int part) {
                     EXPECT_EQ(static_cast<double>(found),
                               there && type == wanted ? test::part_value(l, s, part) : 0.0);
@@ -181,8 +236,8 @@ TEST_P(EveryPair, HasSingleSamplesOfItsOwnTypeInTheHostsOrder) {
         }
     }
 }
-INSTANTIATE_TEST_SUITE_P(Orders, EveryPair, testing::Values(0, 1),
-                         [](const auto& row) { return row.param ? "BigEndian" : "LittleEndian"; });
+INSTANTIATE_TEST_SUITE_P(Layouts, EveryPair, testing::ValuesIn(kLayouts),
+                         [](const auto& row) { return row.param.name; });
 
 struct RoundingRow {
     double value;

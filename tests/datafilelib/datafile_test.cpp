@@ -8,7 +8,6 @@
 #include <climits>
 #include <cstring>
 #include <filesystem>
-#include <numeric>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -422,6 +421,42 @@ TEST(HostileDescriptions, AreRefusedBeforeMemoryIsTaken) {
     }
 }
 
+// Blocks and regions that leave the lines or the file, by either class.
+TEST(HostileRegions, AreRefusedBeforeMemoryIsTaken) {
+    const test::Report report;
+    const test::CapturedStderr silent;
+    const std::string name = report.file("raster"), content(100, 'x');
+    test::write_text(name, content);
+    const struct {
+        int line, lines, sample, samples, width, status;
+    } rows[] = {
+        {-1, 1, 0, 10, 10, 1}, {0, -1, 0, 10, 10, 1}, {0, 1, -1, 5, 5, 1}, {0, 1, 6, 5, 5, 1},
+        {0, 1, 0, -3, 5, 1},   {4, 2, 0, 10, 10, 4},  {0, 1, 0, 10, 9, 1}, {INT_MAX, INT_MAX, 0, 10, 10, 4}};
+    for (const auto& row : rows) {
+        SCOPED_TRACE(testing::Message()
+                     << row.line << ' ' << row.lines << ' ' << row.sample << ' ' << row.samples);
+        DataFile file;
+        BufferFile buffer{name.c_str()};
+        file.setFilename(name.c_str());
+        describe(file, 5, 10, INT16, 0, 0, 0);
+        buffer.copyDescription(file);
+        short untouched = 77;
+        BufferIO region{&file, row.sample, row.samples, row.line, row.lines, INT16};
+        ASSERT_EQ(file.open(3), 0);
+        EXPECT_EQ(region.readbuffer(reinterpret_cast<char*>(&untouched), row.width), row.status);
+        EXPECT_TRUE(row.status != 1 || region.writebuffer(reinterpret_cast<char*>(&untouched), row.width) == 1);
+        for (const int mode : {BufferFile::READ, BufferFile::READ_WRITE}) {
+            if (row.width < row.samples) continue;
+            buffer.open(mode);
+            buffer.readbuffer(&untouched, row.line, row.lines, row.sample, row.samples);
+            if (row.status == 1) buffer.writebuffer(&untouched, row.line, row.lines, row.sample, row.samples);
+            buffer.close();
+        }
+        EXPECT_EQ(untouched, 77);
+        EXPECT_EQ(test::read_text(name), content);
+    }
+}
+
 // A count in the text that 32 bits do not hold does not wrap round to a small one.
 TEST(HostileDescriptions, AreNotCutToFit) {
     const test::TemporaryFolder folder;
@@ -437,80 +472,6 @@ TEST(HostileDescriptions, AreNotCutToFit) {
         EXPECT_EQ(file.NrOfLinesPerImage, *count == '-' ? INT_MIN : INT_MAX) << count;
     }
 }
-
-/** Every layout of prefix and header, as DataFile regions see it. */
-struct Layout {
-    const char* name;
-    int prefix;
-    int64_t offset;
-    int buffer;
-};
-constexpr Layout kLayouts[] = {{"Plain", 0, 0, 0},   {"Prefix", 5, 0, 0},         {"Header", 0, 13, 0},
-                               {"Both", 17, 101, 0}, {"LargePrefix", 6000, 7, 0}, {"Buffered", 5, 13, 64}};
-class Regions : public testing::TestWithParam<Layout> {
-protected:
-    Regions() {
-        describe(file_, 9, 21, INT16, 1, GetParam().prefix, GetParam().offset);
-        file_.setFilename(report_.file("region.raw").c_str());
-        bytes_ = test::raster_bytes(file_);
-        test::write_text(file_.FileName, bytes_);
-        file_.BufferSize = GetParam().buffer;
-    }
-    [[nodiscard]] std::size_t start(int line) const {
-        return static_cast<std::size_t>(file_.HeaderOffset + line * (21 * 2 + file_.RowPrefix));
-    }
-    test::Report report_;
-    DataFile file_;
-    std::string bytes_;
-};
-
-TEST_P(Regions, AreCutOutWithAnyRowWidth) {
-    for (const int width : {8, 11}) {
-        std::vector<float> values(static_cast<std::size_t>(4 * width), -99.0F);
-        BufferIO region{&file_, 6, 8, 3, 4, FLOAT32};
-        ASSERT_EQ(region.readbuffer(reinterpret_cast<char*>(values.data()), width), 0);
-        for (int line = 0; line < 4; ++line) {
-            for (int sample = 0; sample < width; ++sample) {
-                const double expected = sample < 8 ? test::part_value(line + 3, sample + 6, 0) : -99.0;
-                EXPECT_EQ(static_cast<double>(values[static_cast<std::size_t>(line * width + sample)]), expected);
-            }
-        }
-        EXPECT_EQ(file_.tell(), static_cast<int64_t>(start(7))) << "the line after";
-    }
-    const test::CapturedStderr silent;
-    char untouched = 'u';
-    EXPECT_EQ((BufferIO{&file_, 6, 8, 3, 4, FLOAT32}.readbuffer(&untouched, 7)), 1);
-    EXPECT_EQ((BufferIO{&file_, 14, 8, 3, 4, FLOAT32}.readbuffer(&untouched, 8)), 1);
-    EXPECT_EQ((BufferIO{&file_, -1, 8, 3, 4, FLOAT32}.readbuffer(&untouched, 8)), 1);
-    EXPECT_EQ((BufferIO{&file_, 0, 8, 8, 2, FLOAT32}.readbuffer(&untouched, 8)), 4);
-    EXPECT_EQ(untouched, 'u');
-}
-
-TEST_P(Regions, AreWrittenIntoTheirPlaceOnly) {
-    const auto prefix = static_cast<std::size_t>(file_.RowPrefix);
-    std::string prefixes(4 * prefix, '\0'), expected = bytes_, old_prefixes;
-    const std::string marks(4 * prefix, '#');
-    std::vector<float> values(4 * 11);
-    std::iota(values.begin(), values.end(), 1000.0F);
-    ASSERT_EQ(file_.open(3), 0);
-    BufferIO region{&file_, 6, 8, 3, 4, FLOAT32};
-    ASSERT_EQ(region.readprefix(prefixes.data()), 0);
-    ASSERT_EQ(region.writebuffer(reinterpret_cast<const char*>(values.data()), 11), 0);
-    ASSERT_EQ(region.writeprefix(marks.data()), 0);
-    ASSERT_EQ(file_.close(), 0);
-    for (int line = 0; line < 4; ++line) {
-        const std::size_t at = start(line + 3);
-        old_prefixes += bytes_.substr(at, prefix);
-        std::string row;
-        for (int sample = 0; sample < 8; ++sample)
-            test::append_part(row, INT16, 1000.0 + line * 11 + sample, true);
-        expected.replace(at, prefix, prefix, '#').replace(at + prefix + 12, row.size(), row);
-    }
-    EXPECT_EQ(prefixes, old_prefixes);
-    EXPECT_EQ(test::read_text(file_.FileName), expected);
-}
-INSTANTIATE_TEST_SUITE_P(Layouts, Regions, testing::ValuesIn(kLayouts),
-                         [](const auto& row) { return row.param.name; });
 
 // The last line of 6 GB takes no more memory than itself, and the hole stays a hole.
 TEST(BufferIORegions, ReachBeyondFourGigabytes) {
