@@ -324,9 +324,20 @@ TEST(Fits, FreeEverythingWhenMemoryRunsOut) {
         Values c(6);
         return polfit(r.x.data(), r.y.data(), r.points(), c.data(), 5);
     });
-    Values design(40, 1.0), b(20, 1.0), x(2);
+    Values design(40, 1.0), b(20, 1.0), x(2), w(2);
     for (std::size_t i = 0; i < 20; ++i) design[2 * i] = static_cast<double>(i);
     test::fail_every_allocation([&] { return lsq_fit(design.data(), 20, 2, b.data(), x.data(), nullptr); });
+    OneBased u{20, 2}, v{2, 2};
+    const int all[] = {1, 1};
+    double chisq = 0.0;
+    test::fail_every_allocation([&] {
+        return lfitd(r.x.data() - 1, r.y.data() - 1, b.data() - 1, 20, x.data() - 1, all - 1, 2, v.get(), &chisq,
+                     powers);
+    });
+    test::fail_every_allocation([&] {
+        return svdfit(r.x.data() - 1, r.y.data() - 1, b.data() - 1, 20, x.data() - 1, 2, u.get(), v.get(),
+                      w.data() - 1, &chisq, powers);
+    });
 }
 
 }  // namespace
