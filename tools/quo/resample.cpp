@@ -2,6 +2,7 @@
 #include <climits>
 #include <complex>
 #include <memory>
+#include <numbers>
 #include <optional>
 #include <vector>
 
@@ -19,6 +20,7 @@ namespace {
 struct ResampleOptions {
     std::string in, out;
     int samples = 0, lines = 0;  // one of them is wanted
+    double centre = 0.0;         // cycles per sample
     bool waitbar = false;
 };
 
@@ -28,44 +30,66 @@ struct Size {
     [[nodiscard]] std::size_t count() const { return static_cast<std::size_t>(nx) * static_cast<std::size_t>(ny); }
 };
 
+/** A phase that turns by so many cycles from sample to sample. */
+std::vector<fcomplex> ramp(double cycles, int count) {
+    std::vector<fcomplex> turns;
+    turns.reserve(static_cast<std::size_t>(count));
+    for (int k = 0; k < count; ++k) turns.emplace_back(std::polar(1.0, 2.0 * std::numbers::pi * cycles * k));
+    return turns;
+}
+
 /** Brings images of one size to another, along one axis: a longer one by zero-padding of the spectrum, a shorter
- * one by cutting it, which keeps what the new sampling can hold. */
+ * one by cutting it, which keeps what the new sampling can hold. Rows are taken one by one: along them, images
+ * have a single one. */
 class Resampler {
 public:
-    Resampler(const Size& in, const Size& out) : in_{in}, out_{out} {
+    /** @param centre  of the band, cycles per sample of the input, which is brought to frequency 0 meanwhile */
+    Resampler(const Size& in, const Size& out, double centre) : in_{in}, out_{out} {
+        if (centre != 0.0) {
+            const double length_in = length(in), length_out = length(out);
+            down_ = ramp(-centre, length(in));
+            up_ = ramp(centre * length_in / length_out, length(out));
+        }
         if (out.count() >= in.count()) {
             require_transform(longer_.setplans(in.nx, in.ny, out.nx, out.ny));
             return;
         }
-        const int along = out.nx != in.nx ? 1 : 0, down = 1 - along;
-        forward_.emplace(in.nx, in.ny, along, down);
-        inverse_.emplace(out.nx, out.ny, -2 * along, -2 * down);
+        const int rows = along() ? 1 : 0, columns = 1 - rows;
+        forward_.emplace(in.nx, in.ny, rows, columns);
+        inverse_.emplace(out.nx, out.ny, -2 * rows, -2 * columns);
     }
 
     /** The input is overwritten. */
     void run(fcomplex* from, fcomplex* to) {
-        if (!forward_) return require_transform(longer_.interpft_p(from, to));
-        forward_->run(from);
-        cut(from, to);
-        inverse_->run(to);
-        const float factor = 1.0F / static_cast<float>(out_.nx != in_.nx ? in_.nx : in_.ny);
-        std::transform(to, to + out_.count(), to, [factor](fcomplex value) { return value * factor; });
+        turn(from, down_);
+        forward_ ? shorten(from, to) : require_transform(longer_.interpft_p(from, to));
+        turn(to, up_);
     }
 
 private:
-    /** The lowest frequencies of either sign; of an even number, one more of the negative. */
-    void cut(const fcomplex* from, fcomplex* to) const {
-        const bool along = out_.nx != in_.nx;
-        const std::ptrdiff_t bin = along ? 1 : in_.nx, bins_in = along ? in_.nx : in_.ny;
-        const std::ptrdiff_t bins = along ? out_.nx : out_.ny, rows = along ? in_.ny : 1;
-        const std::ptrdiff_t upper = (bins + 1) / 2, lower = bins - upper;
-        for (std::ptrdiff_t row = 0; row < rows; ++row, from += bins_in * bin, to += bins * bin) {
-            std::copy_n(from, upper * bin, to);
-            std::copy_n(from + (bins_in - lower) * bin, lower * bin, to + upper * bin);
-        }
+    [[nodiscard]] bool along() const { return in_.ny == 1 && out_.ny == 1; }
+    [[nodiscard]] int length(const Size& size) const { return along() ? size.nx : size.ny; }
+    /** Samples that belong together: of a row that is a place on the axis, or single ones. */
+    [[nodiscard]] std::ptrdiff_t step() const { return along() ? 1 : in_.nx; }
+
+    void turn(fcomplex* image, const std::vector<fcomplex>& turns) const {
+        for (const fcomplex by : turns)
+            for (std::ptrdiff_t k = 0; k < step(); ++k) *image++ *= by;
+    }
+
+    void shorten(fcomplex* from, fcomplex* to) const {
+        forward_->run(from);
+        // The lowest frequencies of either sign; of an even number, one more of the negative.
+        const std::ptrdiff_t upper = (length(out_) + 1) / 2, lower = length(out_) - upper;
+        std::copy_n(from, upper * step(), to);
+        std::copy_n(from + (length(in_) - lower) * step(), lower * step(), to + upper * step());
+        inverse_->run(to);
+        const float factor = 1.0F / static_cast<float>(length(in_));
+        std::transform(to, to + out_.count(), to, [factor](fcomplex value) { return value * factor; });
     }
 
     Size in_, out_;
+    std::vector<fcomplex> down_, up_;  // empty where the band is centred
     interp longer_;
     std::optional<Transform> forward_, inverse_;
 };
@@ -85,7 +109,10 @@ public:
 class Resampling {
 public:
     Resampling(const ResampleOptions& options, const RasterDescription& in)
-        : lines_{options.lines > 0}, in_{options.in, in}, out_{options.out, Wanted{options, in}} {}
+        : lines_{options.lines > 0},
+          centre_{options.centre},
+          in_{options.in, in},
+          out_{options.out, Wanted{options, in}} {}
 
     void run(bool waitbar) {
         Progress progress{Progress::Unit::kBytes, waitbar ? "Resampling" : nullptr};
@@ -101,7 +128,7 @@ private:
     // Each line is an image of its own, so that nothing depends on how many are read at once.
     void by_lines(Progress& progress) {
         const Size in{from().NrOfPixelsPerLine, 1}, out{to().NrOfPixelsPerLine, 1};
-        Resampler resampler{in, out};
+        Resampler resampler{in, out, centre_};
         source_.resize(in.count());
         result_.resize(out.count());
         for (int line = 0; line < from().NrOfLinesPerImage; ++line) {
@@ -120,7 +147,7 @@ private:
         const auto fitting = kStripSamples / (std::int64_t{lines_in} + lines_out);
         const int width = static_cast<int>(std::clamp<std::int64_t>(fitting, 1, samples));
         const Size in{width, lines_in}, out{width, lines_out};
-        Resampler resampler{in, out};
+        Resampler resampler{in, out, centre_};
         take_room();
         source_.resize(in.count());
         result_.resize(out.count());
@@ -162,6 +189,7 @@ private:
     static constexpr std::int64_t kStripSamples = 8 << 20;  // read and written: 64 MiB
 
     bool lines_;
+    double centre_;
     RasterReader in_;
     NewRaster out_;
     std::vector<fcomplex> source_, result_;
@@ -175,6 +203,8 @@ int resample(const ResampleOptions& options) {
     read_description(options.in, description);
     if (description.NrOfLinesPerImage < 1 || description.NrOfPixelsPerLine < 1)
         throw Failure(options.in + ": is empty");
+    if (options.centre != 0.0 && description.is_complex() == 0)
+        throw WrongUse("--centre: samples that are real have a band around 0");
     note_interrupts();
     Resampling{options, description}.run(options.waitbar);
     return kFine;
@@ -191,6 +221,8 @@ void add_resample(CLI::App& app, Job& job) {
     CLI::App* size = command->add_option_group("New size")->require_option(1);
     size->add_option("--samples", options->samples, "Samples per line")->check(CLI::Range(1, INT_MAX));
     size->add_option("--lines", options->lines, "Lines")->check(CLI::Range(1, INT_MAX));
+    command->add_option("--centre", options->centre, "Centre of the band in cycles per sample, where it is not 0")
+        ->check(CLI::Range(-0.5, 0.5));
     add_waitbar_option(*command, options->waitbar);
     command->callback([options, &job] { job = [options] { return resample(*options); }; });
 }

@@ -33,9 +33,10 @@ using Power = std::vector<double>;
 
 /** A taper, so that strong targets stay within their bins. */
 std::vector<float> hann(int length) {
-    std::vector<float> window;
-    for (int k = 0; k < length; ++k)
-        window.push_back(static_cast<float>(0.5 - 0.5 * std::cos(2.0 * std::numbers::pi * (k + 0.5) / length)));
+    std::vector<float> window(static_cast<std::size_t>(length));
+    double place = 0.5;
+    for (float& factor : window)
+        factor = static_cast<float>(0.5 - 0.5 * std::cos(2.0 * std::numbers::pi * place++ / length));
     return window;
 }
 
