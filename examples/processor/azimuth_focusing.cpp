@@ -13,6 +13,7 @@ namespace {
 constexpr double kPi = std::numbers::pi;
 constexpr int kGuardLines = 8;                  // beyond the aperture, for its soft ends
 constexpr double kLargestMigrationMiss = 0.05;  // samples
+constexpr double kLargestDrift = 0.05;          // rad, of the phase between the middle of a strip and its ends
 constexpr int kFewestSamples = 64;              // of a block, whatever the migration
 
 /** What the histories of all targets of the data run through. */
@@ -20,13 +21,29 @@ struct Reach {
     double first_s, last_s;  // times of the aperture, after zero Doppler
     double migration_s;      // range time, at most
     double steepest;         // migration per range, at most
+    double drift_rad_s;      // of the phase that a squint adds
 };
+
+/** How fast the phase that a squint adds changes along the orbit, rad/s. */
+double drift_of(GeneralSAR& product, const ROI_Obj& data, double height_m) {
+    const double middle_s = data.SlowStartTime + 0.5 * data.SlowTimeLength;
+    const double range_s = data.FastStartTime + 0.5 * data.FastTimeLength;
+    double centre_hz = 0.0;
+    require(product.polynomials.EvaluateDC(range_s, middle_s, &centre_hz), "the Doppler centroid");
+    ROI_Obj half;
+    data.clone(&half);
+    half.SetSlowAxe(data.SlowStartTime, 0.5 * data.SlowTimeDelta, data.Lines);
+    const double early = RangeHistories{product, half, height_m}.at(range_s).phase_rad(centre_hz);
+    half.SetSlowAxe(middle_s, 0.5 * data.SlowTimeDelta, data.Lines);
+    const double late = RangeHistories{product, half, height_m}.at(range_s).phase_rad(centre_hz);
+    return std::abs(late - early) / (0.5 * data.SlowTimeLength);
+}
 
 Reach reach_of(GeneralSAR& product, const ROI_Obj& data, const DopplerBand& band, double height_m) {
     constexpr int kRanges = 5;
     const RangeHistories histories{product, data, height_m};
     const double middle_s = data.SlowStartTime + 0.5 * data.SlowTimeLength;
-    Reach reach{1e9, -1e9, 0.0, 0.0};
+    Reach reach{1e9, -1e9, 0.0, 0.0, drift_of(product, data, height_m)};
     for (int i = 0; i < kRanges; ++i) {
         const double range_s = data.FastStartTime + i * data.FastTimeLength / (kRanges - 1);
         double centre_hz = 0.0;
@@ -53,7 +70,9 @@ void lay_out_lines(BlockLayout& layout, const AzimuthConf& conf, const ROI_Obj& 
         throw Failure{"the data has " + std::to_string(data.Lines) + " lines; an aperture has " +
                       std::to_string(after - before + 1)};
     const int overlap = std::max(after - before, conf.AzimuthOverlap);
-    const int wanted = std::max(conf.LinesInBlock, overlap + overlap / 2);
+    const double strip = 2.0 * kLargestDrift / (reach.drift_rad_s * data.SlowTimeDelta);
+    const int longest = overlap + static_cast<int>(std::min(strip, static_cast<double>(data.Lines)));
+    const int wanted = std::max(std::min(conf.LinesInBlock, longest), overlap + overlap / 2);
     layout.block_lines = genpow(std::min(wanted, data.Lines + overlap - (after - before)), 1);
     layout.step_lines = layout.block_lines - overlap;
 }
@@ -122,17 +141,16 @@ RowPhase AzimuthFocusing::middle_phase(double doppler_hz) const {
     const double step_hz = 1.0 / (range_step_s_ * block_.samples());
     const double phase_per_hz = 4.0 * kPi * middle_.range_m / kLightSpeed;
     const double dispersion = -0.5 * phase_per_hz * (1.0 - d * d) * middle_.lambda_m / (kLightSpeed * d * d * d);
-    return {4.0 * kPi * middle_.range_m / middle_.lambda_m * (d - 1.0) - miss_.at(doppler_hz) + kPi / 4.0,
+    return {kPi / 4.0 - middle_.phase_rad(doppler_hz) - miss_.at(doppler_hz),
             phase_per_hz * (1.0 / d - 1.0) * step_hz, dispersion * step_hz * step_hz};
 }
 
 /** What the phase of a column's own history adds to that of the middle, as a parabola in the column's number. */
 RowPhase AzimuthFocusing::column_phase(double doppler_hz) const {
-    const auto phase = [&](const Hyperbola& history) {
-        return 4.0 * kPi * history.range_m / history.lambda_m * (history.cosine(doppler_hz) - 1.0);
-    };
-    const double half = static_cast<double>(block_.samples() / 2);  // columns
-    const double near = phase(near_) - phase(middle_), far = phase(far_) - phase(middle_);
+    const int middle = block_.samples() / 2;
+    const double half = middle;  // columns from the near to the middle range, and on to the far
+    const double phase = middle_.phase_rad(doppler_hz);
+    const double near = phase - near_.phase_rad(doppler_hz), far = phase - far_.phase_rad(doppler_hz);
     return {0.0, (far - near) / (2.0 * half), (far + near) / (2.0 * half * half)};
 }
 

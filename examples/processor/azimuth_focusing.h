@@ -29,8 +29,9 @@ struct DopplerBand {
 
 /** Lays blocks out for compressed data of the region `data`, so that each holds whole apertures: the lines and
  * samples that the histories of its targets run through. Blocks become longer than the configuration's, and
- * overlap more, where that takes it; they become narrower where a block's edge would migrate otherwise than its
- * middle by more than a twentieth of a sample. */
+ * overlap more, where that takes it. They become narrower where a block's edge would migrate otherwise than its
+ * middle by more than a twentieth of a sample, and shorter where the orbit changes the phase at the Doppler
+ * centroid by more than 0.05 rad from the middle of a block's lines to their ends. */
 BlockLayout lay_out(GeneralSAR& product, const AzimuthConf& conf, const ROI_Obj& data, const DopplerBand& band,
                     double height_m);
 

@@ -22,6 +22,10 @@ double Hyperbola::fm_rate_hz_s(double doppler_hz) const {
     return -2.0 * speed2 * d * d * d / (lambda_m * range_m);
 }
 
+double Hyperbola::phase_rad(double doppler_hz) const {
+    return 4.0 * std::numbers::pi * range_m / lambda_m * (1.0 - cosine(doppler_hz));
+}
+
 double RangeHistories::PhasePolynomial::at(double doppler_hz) const {
     const double x = (doppler_hz - centre_hz) / half_band_hz;
     return ((coefficients[3] * x + coefficients[2]) * x + coefficients[1]) * x + coefficients[0];
@@ -55,7 +59,8 @@ RangeHistories::PhasePolynomial RangeHistories::miss(double range_s, double cent
         require(orbit.earth2sat(target.data(), &azimuth_s, &unused, doppler_hz), "the history of a target");
         const double cycles =
             2.0 * distance(orbit, azimuth_s, target) / hyperbola.lambda_m + doppler_hz * (azimuth_s - middle_s_);
-        phase[i] = kTurn * (2.0 * hyperbola.range_m * hyperbola.cosine(doppler_hz) / hyperbola.lambda_m - cycles);
+        const double turns = cycles - 2.0 * hyperbola.range_m / hyperbola.lambda_m;
+        phase[i] = -kTurn * turns - hyperbola.phase_rad(doppler_hz);
     }
     require(polfit(x, phase, kFrequencies, missing.coefficients.data(), 3), "the phase of a target");
     return missing;

@@ -30,6 +30,7 @@ struct Hyperbola {
     [[nodiscard]] double time_s(double doppler_hz) const;        // t
     [[nodiscard]] double migration_m(double doppler_hz) const;   // R - R0
     [[nodiscard]] double fm_rate_hz_s(double doppler_hz) const;  // df/dt at f
+    [[nodiscard]] double phase_rad(double doppler_hz) const;     // phase, against that at zero Doppler
 };
 
 /** The range histories within a region of zero-Doppler times. */
