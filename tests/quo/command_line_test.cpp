@@ -11,12 +11,28 @@ using testing::StartsWith;
 
 const std::string kHeader = scene_file("s1a_iw1_slc_20220104_asc");
 
-TEST(CommandLine, HelpNamesEverySubcommand) {
-    const auto help = quo({"--help"});
-    EXPECT_EQ(help.exit_status, 0);
-    for (const char* subcommand : {"geolocate", "orbit", "time", "tiepoints"}) {
-        EXPECT_THAT(help.out, HasSubstr(subcommand));
-        EXPECT_EQ(quo({subcommand, "--help"}).exit_status, 0);
+// The names of the subcommands, as the help lists them.
+std::vector<std::string> subcommands() {
+    std::istringstream help{quo({"--help"}).out};
+    std::vector<std::string> names;
+    bool listed = false;
+    for (std::string line; std::getline(help, line);) {
+        if (listed && line.starts_with("  ") && line[2] != ' ')
+            names.push_back(line.substr(2, line.find(' ', 2) - 2));
+        listed = listed || line == "Subcommands:";
+    }
+    return names;
+}
+
+TEST(CommandLine, EverySubcommandHasItsHelpAndItsSectionInTheManual) {
+    const std::string manual = test::read_text(std::string{QUO_TEST_DATA} + "/../../docs/tools.md");
+    const std::vector<std::string> names = subcommands();
+    EXPECT_GE(names.size(), 15U);
+    for (const std::string& name : names) {
+        SCOPED_TRACE(name);
+        EXPECT_EQ(quo({name, "--help"}).exit_status, 0);
+        EXPECT_THAT(manual, testing::ContainsRegex("\n## [^\n]*quo " + name + "[\n,]"));
+        EXPECT_THAT(manual, testing::ContainsRegex("\n(\\$ )?quo " + name + " [^\n]")) << "how it is called";
     }
 }
 

@@ -84,7 +84,7 @@ int footprint(const std::string& header) {
         {"properties", {{"header", header}, {"scene", product.dataSetInfo.SceneID}}},
         {"geometry", geometry_of(ring)}};
     Output output{"-"};
-    output.write(feature.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n");
+    output.write(feature.dump(-1, ' ', false, nlohmann::json::error_handler_t::replace) + "\n");
     output.commit();
     return kFine;
 }
