@@ -8,7 +8,7 @@
 namespace {
 
 constexpr const char* kAbout =
-    "Radar geometry from the headers of synthetic aperture radar products: orbits, geolocation, times.\n"
+    "Products of synthetic aperture radar: what their headers say, where they lie, and their rasters.\n"
     "Times are seconds since 1 January 1985 without leap seconds, range times are two-way.";
 constexpr const char* kFooter =
     "Exit status: 0 fine; 1 a job that failed, rows without a solution, or findings; 2 wrong use.\n";
