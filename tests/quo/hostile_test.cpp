@@ -110,6 +110,7 @@ TEST_F(HostileFiles, FullDisksLeaveOlderFilesWhole) {
         {"vrt", in},
         {"set", header, "SamplingConstants/prf_hz", "17"},
         {"derive", header},
+        {"config", "new", "AzimuthConf", "-o", header},
         {"coregister", scene, scene, "-o", header},
         {"geolocate", scene, "--to", "ground", "--input", file("points.csv"), "--output", file("out.csv")},
     };
