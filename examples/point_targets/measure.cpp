@@ -77,15 +77,16 @@ double parabola_peak(double before, double middle, double after) {
 
 /** A cut through the peak: power at fine steps. */
 struct Cut {
-    std::vector<double> power;
+    std::vector<double> powers;
     int peak;
+    [[nodiscard]] int size() const { return static_cast<int>(powers.size()); }
+    [[nodiscard]] double at(int i) const { return powers[static_cast<std::size_t>(i)]; }
 };
 
 /** Steps from the peak to the place where the power falls below a level, to one side. */
 double steps_to(const Cut& cut, double level, int direction) {
-    for (int i = cut.peak; i > 0 && i + 1 < static_cast<int>(cut.power.size()); i += direction) {
-        const double here = cut.power[static_cast<std::size_t>(i)];
-        const double next = cut.power[static_cast<std::size_t>(i + direction)];
+    for (int i = cut.peak; i > 0 && i + 1 < cut.size(); i += direction) {
+        const double here = cut.at(i), next = cut.at(i + direction);
         if (next < level) return std::abs(i - cut.peak) + (here - level) / (here - next);
     }
     throw Failure{"a response without an end"};
@@ -94,20 +95,18 @@ double steps_to(const Cut& cut, double level, int direction) {
 /** The first minimum to one side of the peak. */
 int null_of(const Cut& cut, int direction) {
     int i = cut.peak;
-    while (i > 0 && i + 1 < static_cast<int>(cut.power.size()) &&
-           cut.power[static_cast<std::size_t>(i + direction)] < cut.power[static_cast<std::size_t>(i)])
-        i += direction;
+    while (i > 0 && i + 1 < cut.size() && cut.at(i + direction) < cut.at(i)) i += direction;
     return i;
 }
 
 Response respond(const Cut& cut, double shift, double theory) {
-    const double top = cut.power[static_cast<std::size_t>(cut.peak)];
+    const double top = cut.at(cut.peak);
     const double width = steps_to(cut, 0.5 * top, -1) + steps_to(cut, 0.5 * top, +1);
     const int left = null_of(cut, -1), right = null_of(cut, +1);
     const int reach = static_cast<int>(10.0 * theory * kFiner);
     double main = 0.0, side = 0.0, highest = 0.0;
     for (int i = std::max(0, cut.peak - reach); i <= std::min(kFine - 1, cut.peak + reach); ++i) {
-        const double power = cut.power[static_cast<std::size_t>(i)];
+        const double power = cut.at(i);
         const bool inside = i >= left && i <= right;
         (inside ? main : side) += power;
         if (!inside) highest = std::max(highest, power);
@@ -154,13 +153,13 @@ Measurement Finder::find(const Target& target) {
     const double rows = row + parabola_peak(amplitude(row - 1, column), top, amplitude(row + 1, column));
     const double columns = column + parabola_peak(amplitude(row, column - 1), top, amplitude(row, column + 1));
     const double chip_line = rows / kFiner;  // after the chip's first line
-    const double peak_line = middle_line - kChip / 2 + chip_line;
-    const double peak_sample = middle_sample - kChip / 2 + columns / kFiner;
+    const int first_line = middle_line - kChip / 2, first_sample = middle_sample - kChip / 2;
+    const double peak_line = first_line + chip_line, peak_sample = first_sample + columns / kFiner;
 
     Cut along{{}, row}, across{{}, column};
     for (int i = 0; i < kFine; ++i) {
-        along.power.push_back(chip.power(i, column));
-        across.power.push_back(chip.power(row, i));
+        along.powers.push_back(chip.power(i, column));
+        across.powers.push_back(chip.power(row, i));
     }
     Measurement found{};
     found.name = target.name;
@@ -189,6 +188,7 @@ void print_response(std::FILE* out, const Response& response) {
 std::vector<Measurement> measure(const std::string& image, const std::vector<Target>& targets) {
     Finder finder{image};
     std::vector<Measurement> found;
+    found.reserve(targets.size());
     for (const Target& target : targets) found.push_back(finder.find(target));
     return found;
 }
