@@ -5,6 +5,7 @@
 # Usage: scripts/check_valgrind.sh BUILD_FOLDER
 set -eu
 cd "$(dirname "$0")/.."
+command -v valgrind >/dev/null || { echo "check_valgrind.sh: install valgrind" >&2; exit 2; }
 build=$(cd "$1" && pwd)
 folder=$(mktemp -d)
 trap 'rm -rf "$folder"' EXIT
