@@ -190,6 +190,20 @@ TEST_F(SmallRaster, DoesNotShowItsBlocks) {
     EXPECT_LT(difference, 1e-3 * power);
 }
 
+// Hamming's weights cost resolution, half as much again, and take the sidelobes away. Amplitudes stay.
+TEST_F(SmallRaster, TradesResolutionForSidelobes) {
+    azimuth_.AzimuthWindowHammingParameter = azimuth_.RangeWindowHammingParameter = 0.46F;
+    focus("weighted");
+    for (const Measurement& target : example::measure(folder_.file("weighted"), echoes_.targets)) {
+        EXPECT_NEAR(target.strength_db, 0.0, 0.5) << target.name;
+        for (const example::Response& response : {target.azimuth, target.range}) {
+            EXPECT_NEAR(response.shift, 0.0, 0.1) << target.name;
+            EXPECT_NEAR(response.resolution / response.theory, 1.47, 0.1) << target.name;
+            EXPECT_LT(response.side_lobe_db, -30.0) << target.name;
+        }
+    }
+}
+
 TEST_F(SmallRaster, IsRefusedWhereItCannotBeFocused) {
     const std::string header = echoes_.raster + ".hdr", good = test::read_text(header);
     struct Fault {
