@@ -41,6 +41,7 @@ struct Parameter {
 
 std::vector<Parameter> parameters_of(const Record& record) {
     std::vector<Parameter> parameters;
+    parameters.reserve(static_cast<std::size_t>(record.elementCount()));
     for (int i = 0; i < record.elementCount(); ++i)
         parameters.push_back({*record.element(i), record.unit(i), record.meaning(i)});
     return parameters;
@@ -48,6 +49,7 @@ std::vector<Parameter> parameters_of(const Record& record) {
 
 std::vector<Parameter> shared_parameters(GeneralSAR_BaseConfiguration& configuration) {
     std::vector<Parameter> parameters;
+    parameters.reserve(GeneralSAR_BaseConfiguration::kSharedParameters);
     for (int i = 0; i < GeneralSAR_BaseConfiguration::kSharedParameters; ++i)
         parameters.push_back({configuration.sharedParameter(i), GeneralSAR_BaseConfiguration::sharedUnit(i),
                               GeneralSAR_BaseConfiguration::sharedMeaning(i)});
@@ -294,7 +296,13 @@ int check(const ConfigOptions& options) {
     std::string text;
     for (const auto& [section, name, reason] : review.findings) {
         list.push_back({{"section", section}, {"name", name}, {"reason", reason}});
-        text += one_line(section + (name.empty() ? "" : "/") + name + "  " + reason) + "\n";
+        std::string line = section;
+        line += name.empty() ? "" : "/";
+        line += name;
+        line += "  ";
+        line += reason;
+        text += one_line(line);
+        text += '\n';
     }
     text += std::to_string(review.findings.size()) + (review.findings.size() == 1 ? " error in " : " errors in ") +
             std::to_string(review.records.size()) + (review.records.size() == 1 ? " record\n" : " records\n");
