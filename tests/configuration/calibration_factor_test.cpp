@@ -5,7 +5,7 @@
 #include "quo_base/generalSAR.h"
 #include "quo_base/generalSAR_configuration.h"
 #include "support/diagnostics.h"
-#include "support/full_disk.h"
+#include "support/limits.h"
 
 namespace {
 

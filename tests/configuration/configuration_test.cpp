@@ -11,7 +11,7 @@
 #include "quo_base/generalSAR_configuration.h"
 #include "support/diagnostics.h"
 #include "support/fields.h"
-#include "support/full_disk.h"
+#include "support/limits.h"
 
 namespace {
 

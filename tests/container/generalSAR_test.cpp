@@ -11,7 +11,7 @@
 
 #include "products.h"
 #include "support/diagnostics.h"
-#include "support/full_disk.h"
+#include "support/limits.h"
 
 namespace {
 

@@ -10,7 +10,7 @@
 
 #include "quo_base/datafile.h"
 #include "support/diagnostics.h"
-#include "support/full_disk.h"
+#include "support/limits.h"
 #include "support/raster.h"
 
 namespace {

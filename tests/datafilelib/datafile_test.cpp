@@ -14,7 +14,7 @@
 
 #include "support/diagnostics.h"
 #include "support/fields.h"
-#include "support/full_disk.h"
+#include "support/limits.h"
 #include "support/raster.h"
 
 namespace {

@@ -10,8 +10,8 @@
 
 #include "annex_files.h"
 #include "quo_base/datafile.h"
-#include "support/full_disk.h"
 #include "support/header_object_suite.h"
+#include "support/limits.h"
 #include "support/raster.h"
 
 namespace {

@@ -12,7 +12,7 @@
 #include "quo_base/gen_utils.h"
 #include "support/diagnostics.h"
 #include "support/fields.h"
-#include "support/full_disk.h"
+#include "support/limits.h"
 #include "support/raster.h"
 
 namespace {

@@ -175,7 +175,7 @@ TEST_F(ProfileStore, FullDiskLeavesTheOldFileWhole) {
     const std::string old = "[s]\nk = 1\nj = 2\n", path = file("a.par", old);
     set(path, "k", "a longer value");
     for (const rlim_t room : {0, 1, 29}) {
-        const test::FileSizeLimit disk{room};
+        const test::FullDisk disk{room};
         EXPECT_EQ(sync(path), -1) << "with room for " << room << " bytes";
         EXPECT_EQ(SyncProfile(nullptr), 0);
         EXPECT_EQ(errno, 0);

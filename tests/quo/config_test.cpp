@@ -3,7 +3,7 @@
 #include <filesystem>
 #include <nlohmann/json.hpp>
 
-#include "support/full_disk.h"
+#include "support/limits.h"
 #include "tool.h"
 
 namespace {

@@ -15,7 +15,7 @@
 
 namespace {
 
-using test::FileSizeLimit;
+using test::FullDisk;
 using test::OrdinaryUser;
 using test::read_text;
 using test::Shelf;
@@ -72,12 +72,12 @@ TEST_P(FailedSave, LeavesTheOldHeaderWhereverTheDiskFillsUp) {
     for (std::size_t room = 0; room < size; room += room < 16 || size - room < 16 ? 1 : 97) {
         SCOPED_TRACE(room);
         const test::CapturedStderr quiet;
-        const FileSizeLimit limit{room};
+        const FullDisk limit{room};
         EXPECT_EQ(GetParam().save(object_, file_.c_str()), 1);
         EXPECT_TRUE(read_text(file_) == old_);
     }
     EXPECT_THAT(test::entries(folder_), ElementsAre("header.xml", "whole.xml"));
-    const FileSizeLimit enough{size};
+    const FullDisk enough{size};
     EXPECT_EQ(GetParam().save(object_, file_.c_str()), 0);
     EXPECT_EQ(read_text(file_), read_text(whole));
 }

@@ -200,7 +200,7 @@ TEST_F(AtomicFileTest, KeepsTheOldFileWhicheverWriteFails) {
         bool written = true, replaced = false;
         int error = 0;
         {
-            const test::FileSizeLimit limit{room};
+            const test::FullDisk limit{room};
             AtomicFile file{name_.c_str()};
             for (std::size_t at = 0; at < content.size(); at += 13) written = file.write(content.substr(at, 13));
             replaced = file.commit();

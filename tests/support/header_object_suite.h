@@ -11,7 +11,7 @@
 
 #include "support/diagnostics.h"
 #include "support/fields.h"
-#include "support/full_disk.h"
+#include "support/limits.h"
 
 /** What holds for every header object of fixed size: instantiate the suite with one case per class.
  *

@@ -12,20 +12,20 @@
 namespace test {
 
 /** No file can grow beyond so many bytes: what a full disk looks like to a writer. */
-class FileSizeLimit {
+class FullDisk {
 public:
-    explicit FileSizeLimit(rlim_t bytes) : handler_{std::signal(SIGXFSZ, SIG_IGN)} {
+    explicit FullDisk(rlim_t bytes) : handler_{std::signal(SIGXFSZ, SIG_IGN)} {
         getrlimit(RLIMIT_FSIZE, &before_);
         const rlimit limit{bytes, before_.rlim_max};
         setrlimit(RLIMIT_FSIZE, &limit);
     }
-    ~FileSizeLimit() {
+    ~FullDisk() {
         setrlimit(RLIMIT_FSIZE, &before_);
         (void)std::signal(SIGXFSZ, handler_);
         errno = 0;
     }
-    FileSizeLimit(const FileSizeLimit&) = delete;
-    FileSizeLimit& operator=(const FileSizeLimit&) = delete;
+    FullDisk(const FullDisk&) = delete;
+    FullDisk& operator=(const FullDisk&) = delete;
 
 private:
     void (*handler_)(int);

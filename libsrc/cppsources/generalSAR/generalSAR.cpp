@@ -1,11 +1,8 @@
 #include "quo_base/generalSAR.h"
 
-#include <cstdio>
-
 #include "diagnosticslib/call_frame.h"
+#include "generalSAR/readable_file.h"
 #include "quorelxmllib/header_session.h"
-#include "sarutillib/bounded_text.h"
-#include "sarutillib/file_io.h"
 
 namespace {
 
@@ -22,14 +19,7 @@ GeneralSAR::GeneralSAR()
 
 int GeneralSAR::GSread(const char* file) {
     quo::CallFrame frame{"GeneralSAR::GSread", kSource};
-    if (!file || !quo::Stream{std::fopen(file, "rb")}) {
-        quo::CallFrame::drop_errno();  // the entry says it all
-        char message[2048];
-        const std::string_view name = quo::text_or_empty(file);
-        quo::format_bounded(message, sizeof message, "File : %.*s DOES NOT EXIST!", static_cast<int>(name.size()),
-                            name.data());
-        return frame.fail(QUO_REFUSED, message);
-    }
+    if (const int status = quo::refuse_missing_file(frame, file)) return status;
     GSdestroy();
     const quo::JoinedSession session{file};
     for (int i = 0; i < kObjects; ++i) present_[i] = objects_[i]->readhdr(file) == QUO_OK;

@@ -1,14 +1,13 @@
 #include "quo_base/generalSAR_configuration.h"
 
 #include <array>
-#include <cstdio>
 #include <limits>
 #include <typeinfo>
 
 #include "diagnosticslib/call_frame.h"
+#include "generalSAR/readable_file.h"
 #include "quorelxmllib/field_table.h"
 #include "sarutillib/bounded_text.h"
-#include "sarutillib/file_io.h"
 
 namespace {
 
@@ -425,14 +424,7 @@ int GeneralSAR_configuration::GSwrite(const char* file, int channel) {
 
 int GeneralSAR_configuration::GSread(const char* file, int channel) {
     quo::CallFrame frame{"GeneralSAR_configuration::GSread", kSource};
-    if (!file || !quo::Stream{std::fopen(file, "rb")}) {
-        quo::CallFrame::drop_errno();  // the entry says it all
-        char message[2048];
-        const std::string_view name = quo::text_or_empty(file);
-        quo::format_bounded(message, sizeof message, "File : %.*s DOES NOT EXIST!", static_cast<int>(name.size()),
-                            name.data());
-        return frame.fail(QUO_REFUSED, message);
-    }
+    if (const int status = quo::refuse_missing_file(frame, file)) return status;
     for (int i = 0; i < kSelectors; ++i) {
         enabled_[i] = true;
         enabled_[i] = table_[i]->readpar(file, channel) == QUO_OK;
