@@ -8,6 +8,7 @@
 #include <climits>
 #include <cstring>
 #include <filesystem>
+#include <limits>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -455,6 +456,22 @@ TEST(HostileRegions, AreRefusedBeforeMemoryIsTaken) {
         EXPECT_EQ(untouched, 77);
         EXPECT_EQ(test::read_text(name), content);
     }
+}
+
+// The block itself has places, the line after it has none: computing that overflowed once.
+TEST(HostileRegions, EndWithThePlacesOfAFile) {
+    const test::Report report;
+    const std::string name = report.file("raster"), content(100, 'x');
+    test::write_text(name, content);
+    BufferFile buffer{name.c_str()};
+    describe(buffer, 5, 1000, INT16, 0, 0, std::numeric_limits<int64_t>::max() - 100);
+    buffer.open(BufferFile::READ_WRITE);
+    buffer.seek(10, BufferFile::FROM_START);
+    const short sample = 77;
+    buffer.writebuffer(&sample, 0, 1, 0, 1);
+    EXPECT_EQ(buffer.tell(), 10);
+    buffer.close();
+    EXPECT_EQ(test::read_text(name), content);
 }
 
 // A count in the text that 32 bits do not hold does not wrap round to a small one.

@@ -2,6 +2,7 @@
 #include <cerrno>
 #include <cstring>
 #include <new>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -23,11 +24,15 @@ public:
 };
 
 /** Two doubles for each sample of a FLOAT64 region whose pieces begin `before` bytes after their lines. Lines
- * without room for them become as long as they need. False when an offset overflows. */
-bool make_room_for_pairs(quo::RasterRegion& region, int64_t before) {
+ * without room for them become as long as they need. */
+void make_room_for_pairs(quo::RasterRegion& region, int64_t before) {
     region.piece *= 2;
     region.distance = std::max(region.distance, before + region.piece);
-    return (quo::Checked<int64_t>{region.distance} * region.count + region.first).value().has_value();
+}
+
+/** Where the line after such a region starts; nothing when that overflows. */
+std::optional<int64_t> line_after_region(const quo::RasterRegion& region, int64_t before) {
+    return (quo::Checked<int64_t>{region.distance} * region.count + (region.first - before)).value();
 }
 
 }  // namespace
@@ -269,12 +274,13 @@ void BufferFile::writeBlock(const void* src, int memory_type, int first_line, in
     auto region = quo::region_of_samples(*this, first_line, lines, first_sample, samples);
     if (!is_writing() || !kernel || !region) return;
     const int64_t before = RowPrefix + int64_t{first_sample} * element_sizeof();
-    if (memory_type == FLOAT_COMPLEX && CellType == FLOAT64 && !make_room_for_pairs(*region, before)) return;
-    if (!flush()) return;
+    if (memory_type == FLOAT_COMPLEX && CellType == FLOAT64) make_room_for_pairs(*region, before);
+    const auto next = line_after_region(*region, before);
+    if (!next || !flush()) return;
     const auto piece = samples * static_cast<int64_t>(quo::sample_size(memory_type));
     quo::write_region(*stream_, *region, {kernel, samples, piece, piece, ByteOrder == 1},
                       static_cast<const char*>(src));
-    dropBuffer(region->first - before + region->count * region->distance);
+    dropBuffer(*next);
 }
 
 void BufferFile::readbuffer(float* dst, int line, int lines, int sample, int samples) {
