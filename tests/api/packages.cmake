@@ -1,11 +1,6 @@
 # Packs what was built into Debian packages, unpacks them into a fresh root, and builds and runs small outside
 # projects against that: with find_package, with pkg-config, and loading the library at run time.
-function(run)
-    execute_process(COMMAND ${ARGV} RESULT_VARIABLE result OUTPUT_VARIABLE out ERROR_VARIABLE out)
-    if(result)
-        message(FATAL_ERROR "${ARGV}\n${out}")
-    endif()
-endfunction()
+include("${CMAKE_CURRENT_LIST_DIR}/../support/run.cmake")
 
 file(REMOVE_RECURSE "${WORK}")
 file(MAKE_DIRECTORY "${WORK}")

@@ -1,10 +1,5 @@
 # Builds the chain's programs against an installed package, as a user would, and asks one for its help.
-function(run)
-    execute_process(COMMAND ${ARGV} RESULT_VARIABLE result OUTPUT_VARIABLE out ERROR_VARIABLE out)
-    if(result)
-        message(FATAL_ERROR "${ARGV}\n${out}")
-    endif()
-endfunction()
+include("${CMAKE_CURRENT_LIST_DIR}/../support/run.cmake")
 
 file(REMOVE_RECURSE "${WORK}")
 run(${CMAKE_COMMAND} --install "${BUILD}" --prefix "${WORK}/prefix")

@@ -10,6 +10,7 @@
 #include "number.h"
 #include "output.h"
 #include "quo_base/gr_pt.h"
+#include "residuals.h"
 #include "scene.h"
 #include "table.h"
 
@@ -32,22 +33,6 @@ struct TiePoint {
 /** What an incidence angle is measured against. The missions differ, by up to 0.04 degrees seen from orbit. */
 enum class Vertical { kEllipsoidNormal, kGeocentricRadius };
 
-/** The differences of one quantity over all points. */
-class Spread {
-public:
-    void add(double difference) {
-        largest_ = std::max(largest_, std::abs(difference));
-        squares_ += difference * difference;
-        ++count_;
-    }
-    double largest() const { return largest_; }
-    double rms() const { return count_ > 0 ? std::sqrt(squares_ / static_cast<double>(count_)) : 0.0; }
-
-private:
-    double largest_ = 0.0, squares_ = 0.0;
-    std::int64_t count_ = 0;
-};
-
 constexpr std::size_t kQuantities = 4;
 struct Quantity {
     const char *heading, *key;
@@ -62,7 +47,7 @@ struct Agreement {
     std::string scene;
     Vertical vertical = Vertical::kEllipsoidNormal;
     std::int64_t points = 0, unsolved = 0;
-    std::array<Spread, kQuantities> spreads;  // in the order of kQuantity
+    std::array<Residuals, kQuantities> residuals;  // in the order of kQuantity
 };
 
 /** The ground point of a sample at a height above the ellipsoid.
@@ -100,10 +85,10 @@ int compare(GeneralSAROrbit& orbit, const TiePoint& tie, Agreement& agreement) {
     if (status == 0) status = ground_at_height(orbit, tie, point);
     if (status != 0) return status;
 
-    agreement.spreads[0].add((time_s - tie.time_s) * 1e6);
-    agreement.spreads[1].add((range_s - tie.range_s) * 0.5 * kLightSpeed);
-    agreement.spreads[2].add(norm(point - truth));
-    agreement.spreads[3].add(incidence_deg(orbit, tie, point, agreement.vertical) - tie.incidence_deg);
+    agreement.residuals[0].add((time_s - tie.time_s) * 1e6);
+    agreement.residuals[1].add((range_s - tie.range_s) * 0.5 * kLightSpeed);
+    agreement.residuals[2].add(norm(point - truth));
+    agreement.residuals[3].add(incidence_deg(orbit, tie, point, agreement.vertical) - tie.incidence_deg);
     return 0;
 }
 
@@ -153,7 +138,7 @@ Agreement check_scene(const std::string& header, const TiepointsOptions& options
                                              table.need("latitude_deg"),   table.need("longitude_deg"),
                                              table.need("height_m"),       table.need("incidence_deg")};
     Agreement agreement{
-        .scene = scene_name(header), .vertical = vertical_of(table, options.incidence), .spreads = {}};
+        .scene = scene_name(header), .vertical = vertical_of(table, options.incidence), .residuals = {}};
     while (table.next()) {
         ++agreement.points;
         const int status = compare(scene.orbit(), tie_point(table, columns), agreement);
@@ -173,8 +158,8 @@ constexpr std::size_t kNumberWidth = 11;
 std::string as_row(const Agreement& agreement, std::size_t name_width) {
     std::string row = agreement.scene + std::string(name_width - agreement.scene.size(), ' ') +
                       padded(std::to_string(agreement.points), 8);
-    for (const Spread& spread : agreement.spreads)
-        row += padded(rough(spread.largest()), kNumberWidth) + padded(rough(spread.rms()), kNumberWidth);
+    for (const Residuals& residual : agreement.residuals)
+        row += padded(rough(residual.largest()), kNumberWidth) + padded(rough(residual.rms()), kNumberWidth);
     return row + "\n";
 }
 
@@ -201,8 +186,8 @@ std::string as_json(const std::vector<Agreement>& list) {
                                      {"without_solution", agreement.unsolved},
                                      {"incidence_against", geocentric ? "geocentric radius" : "ellipsoid normal"}};
         for (std::size_t i = 0; i < kQuantities; ++i)
-            entry[kQuantity[i].key] = {{"largest", agreement.spreads[i].largest()},
-                                       {"rms", agreement.spreads[i].rms()}};
+            entry[kQuantity[i].key] = {{"largest", agreement.residuals[i].largest()},
+                                       {"rms", agreement.residuals[i].rms()}};
         json.push_back(entry);
     }
     return json.dump(2) + "\n";
