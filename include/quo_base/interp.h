@@ -27,7 +27,8 @@ public:
      * status of fft_makep_c(). After a failure there are no plans and no sizes. */
     int setplans(int nx_in, int ny_in, int nx_out, int ny_out);
 
-    /** Releases the plans and forgets the sizes. Returns 0. */
+    /** Releases the plans and keeps the sizes: interpft_p() then copies images of equal sizes and refuses others.
+     * Returns 0. */
     int destroyplans();
 
     /** Forgets the sizes without releasing anything: interpft_p() is refused until setplans() is called. */
@@ -43,7 +44,8 @@ public:
      *
      * @param[in,out] in   ny_in rows of nx_in; overwritten by its spectrum along the axis that changes
      * @param[out]    out  ny_out rows of nx_out, apart from `in`
-     * @return 0; 1 for null pointers or without sizes; 7 when an engine is out of memory */
+     * @return 0; 1 for null pointers, without sizes, or without the plans that they need; 7 when an engine is out
+     * of memory */
     int interpft_p(fcomplex* in, fcomplex* out);
 
     /** setplans(), interpft_p() and destroyplans().
@@ -59,8 +61,9 @@ public:
      * @param[in]  nx_in, ny_in    size of the image
      * @param[in]  nx_out, ny_out  size that it gets
      * @param[out] out             ny_out rows of nx_out, apart from `in`
-     * @return 0, also when nothing grows (nothing is written then); 1 for null pointers, a size below 1, an image
-     * beyond any memory, or when one axis grows and the other changes too */
+     * @return 0, also when nothing grows (nothing is looked at or written then, whatever the other arguments are);
+     * 1 for null pointers, a size below 1, an image beyond any memory, or when one axis grows and the other
+     * changes too */
     int interp_lin(const fcomplex* in, int nx_in, int ny_in, int nx_out, int ny_out, fcomplex* out);
     int interp_lin(const float* in, int nx_in, int ny_in, int nx_out, int ny_out, float* out);
     int interp_lin(const double* in, int nx_in, int ny_in, int nx_out, int ny_out, double* out);

@@ -124,6 +124,13 @@ TEST_F(Interp, CopiesEqualSizesAndKeepsItsPlansForMany) {
     EXPECT_TRUE(std::equal(twice.begin(), twice.end(), out_.begin()));
     EXPECT_EQ(interp_.destroyplans(), 0);
     EXPECT_EQ(interp_.destroyplans(), 0);
+    EXPECT_EQ(interp_.interpft_p(in_.data(), out_.data()), 1) << "sizes that need the plans";
+    // The sizes went with the plans, so that equal ones were no longer copied.
+    ASSERT_EQ(interp_.setplans(8, 8, 8, 8), 0);
+    EXPECT_EQ(interp_.destroyplans(), 0);
+    std::fill(out_.begin(), out_.end(), fcomplex{});
+    EXPECT_EQ(interp_.interpft_p(in_.data(), out_.data()), 0);
+    EXPECT_TRUE(std::equal(in_.begin(), in_.end(), out_.begin()));
 }
 
 TEST_F(Interp, RefusesWithoutWritingAndSaysSo) {
@@ -180,6 +187,7 @@ TEST_F(Interp, LinearRowsAndColumnsHoldTheLast) {
 
     for (const auto& [nx, ny] : {std::pair{1, 2}, {3, 1}, {2, 2}, {3, 3}})
         EXPECT_EQ(interp_.interp_lin(rows, 3, 3, nx, ny, down), 0) << "nothing grows";
+    EXPECT_EQ(interp_.interp_lin(static_cast<const float*>(nullptr), 0, -1, 0, -1, down), 0) << "not looked at";
     EXPECT_EQ(down[1], 0.5F);
 }
 
