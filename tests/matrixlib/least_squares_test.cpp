@@ -191,8 +191,11 @@ TEST(Polfit, IgnoresASingularSystemAndRefusesNoPoints) {
     EXPECT_EQ(report.entries("ERROR_CALL_TREE")[1].function, "gen_polfit()");
 }
 
-TEST(Polval, IsZeroBelowDegreeZero) {
-    const double c[] = {2.0, -3.0, 0.5};
+TEST(Polval, IsZeroBelowDegreeZeroAndInfiniteAtInfinity) {
+    const double c[] = {2.0, -3.0, 0.5}, infinity = std::numeric_limits<double>::infinity();
+    EXPECT_EQ(polval(c, 2, -infinity), infinity) << "Horner's rule once began with 0 times infinity";
+    EXPECT_EQ(polval(c, 1, infinity), -infinity);
+    EXPECT_EQ(polval(c, 0, infinity), 2.0);
     EXPECT_EQ(polval(c, -1, 4.0), 0.0);
     EXPECT_EQ(polval(c, 2, 4.0), 2.0 - 12.0 + 8.0);
 }
