@@ -68,8 +68,8 @@ QUO_BASE_API const char* fft_engine_error(void) QUO_NOEXCEPT;
  * @return 0; 1 for a null plan, n < 1, m < 1 or an image that no address space holds; 2 for nfft outside 1..n; 3
  * for mfft outside 1..m; 4 when the row transforms cannot be had (unknown direction, no memory, no engine); 5 when
  * the column transforms cannot be had, in which case nothing is left of the rows'. fft_engine_error() tells the
- * cause where it lies with the engine. Memory that the engine may take is looked for before it starts: three to
- * twelve times the transform, with great prime factors the most. */
+ * cause where it lies with the engine. Memory that the engine may take is looked for before it starts: some five
+ * times the transform, ten times with prime factors above 13, and up to 100 MiB more. */
 QUO_BASE_API int fft_makep_c(FftPlan* plan, int n, int nfft, int m, int mfft, int dir_rows, int dir_cols,
                              int in_place) QUO_NOEXCEPT;
 
