@@ -14,9 +14,9 @@
 #include "support/diagnostics.h"
 
 #ifdef __SANITIZE_ADDRESS__
-// What cannot be had is asked for on purpose here.
+// What cannot be had is asked for on purpose here, and what is given back must be there to be had again.
 extern "C" [[gnu::visibility("default")]] const char* __asan_default_options() {
-    return "allocator_may_return_null=1";
+    return "allocator_may_return_null=1:quarantine_size_mb=0:thread_local_quarantine_size_kb=0";
 }
 #endif
 
