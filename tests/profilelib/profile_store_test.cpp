@@ -1,6 +1,8 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <array>
 #include <cerrno>
@@ -213,6 +215,54 @@ TEST_F(ProfileStore, WhatMayNotBeReadIsEmptyAndWhatMayNotBeWrittenStays) {
         fs::remove(missing());
         EXPECT_EQ(entries(), 1);
     }
+}
+
+/** No file can be opened, as in a process that has used up its descriptors. */
+class NoDescriptors {
+public:
+    NoDescriptors() {
+        getrlimit(RLIMIT_NOFILE, &before_);
+        const int next = dup(STDERR_FILENO);
+        close(next);
+        const rlimit limit{static_cast<rlim_t>(next), before_.rlim_max};
+        setrlimit(RLIMIT_NOFILE, &limit);
+    }
+    ~NoDescriptors() { setrlimit(RLIMIT_NOFILE, &before_); }
+    NoDescriptors(const NoDescriptors&) = delete;
+    NoDescriptors& operator=(const NoDescriptors&) = delete;
+
+private:
+    rlimit before_{};
+};
+
+// A file that could not be read counted as empty: a save replaced all of it by the little that was set.
+TEST_F(ProfileStore, WhatCouldNotBeReadIsNotReplaced) {
+    const std::string old = "[s]\nk = 1\n[t]\nj = 2\n", path = file("a.par", old);
+    const auto set_a_key = [&path] {
+        EXPECT_EQ(get(path, "j", "t"), nullptr);
+        EXPECT_STREQ(set(path, "k", "2"), "2");
+        EXPECT_EQ(errno, 0);
+    };
+    chmod(folder_.path().c_str(), 0777);
+    for (const mode_t mode : {0666, 0222}) {
+        SCOPED_TRACE(testing::Message() << std::oct << mode);
+        chmod(path.c_str(), mode);
+        const test::OrdinaryUser user;
+        if (mode == 0666) {
+            const NoDescriptors none;
+            set_a_key();
+        } else {
+            set_a_key();
+        }
+        EXPECT_EQ(sync(path), 1);
+        EXPECT_EQ(SetParInt(path.c_str(), "k", 0, nullptr, 0, "s"), 0) << "the status of the write";
+        EXPECT_EQ(SyncProfile(nullptr), 0);
+        FreeProfile(nullptr);
+    }
+    chmod(path.c_str(), 0600);
+    EXPECT_EQ(read_text(path), old);
+    EXPECT_STREQ(get(path, "j", "t"), "2");
+    EXPECT_EQ(entries(), 1);
 }
 
 TEST_F(ProfileStore, BinaryNoiseLoadsAndStaysStable) {

@@ -39,7 +39,7 @@ public:
     /** Empties the table and makes room for half as many again as it held. */
     void make_anew() {
         const std::size_t size = 15 * used_ / 8 + kFirstSize;
-        slots_ = {};
+        std::vector<Slot>{}.swap(slots_);  // given back before the new ones are taken
         slots_.resize(size);
         used_ = 0;
     }

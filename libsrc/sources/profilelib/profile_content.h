@@ -34,7 +34,7 @@ public:
     /** Takes a file's text, less than 2 GiB, read by the grammar that profile.h describes. To be called once, on
      * an empty content. */
     void parse(std::string text);
-    /** Hands the file's text in its written layout to `take(std::string_view)`, in pieces of a megabyte or little
+    /** Hands the file's text in its written layout to `take(std::string_view)`, in pieces of 64 KiB or little
      * more, as long as that returns true. Whether it did for all of them. */
     template <typename Take>
     bool write(Take take) const;
@@ -116,7 +116,7 @@ bool ProfileContent::all_keys(const std::deque<Key>& keys, const Section& sectio
 
 template <typename Take>
 bool ProfileContent::write(Take take) const {
-    constexpr std::size_t kPiece = std::size_t{1} << 20;
+    constexpr std::size_t kPiece = std::size_t{1} << 16;
     std::string piece;
     const auto take_piece = [&] {
         const bool taken = take(std::string_view{piece});
