@@ -154,13 +154,16 @@ TEST_F(ProfileStore, FolderIsAnEmptyFileThatCannotBeWritten) {
     EXPECT_EQ(sync(""), 1);
 }
 
-TEST_F(ProfileStore, EndlessDeviceIsEmptyAndNotReplaced) {
+TEST_F(ProfileStore, DeviceIsNotReplacedAndAnEndlessOneNotWritten) {
     const std::string link = missing("full.par");
     fs::create_symlink("/dev/full", link);
     EXPECT_EQ(get(link, "k"), nullptr);
     set(link, "k", "v");
     EXPECT_EQ(sync(link), 1);
     EXPECT_TRUE(fs::is_symlink(link) && fs::is_character_file(link));
+    set("/dev/null", "k", "v");
+    EXPECT_EQ(sync("/dev/null"), 0);
+    EXPECT_TRUE(fs::is_character_file("/dev/null"));
 }
 
 // What is too long to be read must not be replaced by the little that is known of it.
@@ -192,9 +195,12 @@ TEST_F(ProfileStore, WhatMayNotBeReadIsEmptyAndWhatMayNotBeWrittenStays) {
     struct Rights {
         mode_t folder, file;
         const char* value;
+        bool saved = false;
     };
-    for (const auto& [folder, mode, value] :
-         {Rights{0555, 0644, "1"}, Rights{0777, 0444, "1"}, Rights{0777, 0, nullptr}}) {
+    // A file that may be written in a folder that may not was refused.
+    for (const auto& [folder, mode, value, saved] : {Rights{0555, 0644, "1"}, Rights{0777, 0444, "1"},
+                                                     Rights{0777, 0, nullptr}, Rights{0555, 0666, "1", true}}) {
+        const test::Report report;
         SCOPED_TRACE(testing::Message() << std::oct << folder << " " << mode);
         const std::string path = file("a.par", "[s]\nk = 1\n");
         chmod(folder_.path().c_str(), folder);
@@ -205,12 +211,14 @@ TEST_F(ProfileStore, WhatMayNotBeReadIsEmptyAndWhatMayNotBeWrittenStays) {
             EXPECT_EQ(errno, 0);
             set(path, "k", "2");
             set(missing(), "k", "2");
-            EXPECT_EQ(sync(path), 1);
+            EXPECT_EQ(sync(path), saved ? 0 : 1);
             EXPECT_EQ(sync(missing()), folder == 0555 ? 1 : 0);
+            EXPECT_EQ(report.entries("WARNING").size(), saved ? 1U : 0U);
+            EXPECT_EQ(errno, 0);
         }
         chmod(folder_.path().c_str(), 0700);
         chmod(path.c_str(), 0600);
-        EXPECT_EQ(read_text(path), "[s]\nk = 1\n");
+        EXPECT_EQ(read_text(path), saved ? "\n[s]\nk = 2\n" : "[s]\nk = 1\n");
         FreeProfile(nullptr);
         fs::remove(missing());
         EXPECT_EQ(entries(), 1);

@@ -6,6 +6,7 @@
 #include <cstdio>
 #include <utility>
 
+#include "diagnosticslib/saved_in_place.h"
 #include "profilelib/out_of_memory.h"
 #include "profilelib/profile_look.h"
 #include "quo_base/profile.h"
@@ -95,6 +96,7 @@ int ProfileStore::write(const File& file) {
     }
     const bool written = file.content.write([&](std::string_view piece) { return target.write(piece); });
     const bool saved = written && target.commit();
+    if (saved) warn_if_in_place(target, "SyncProfile", "profile");
     errno = 0;
     return saved ? 0 : -1;
 }
