@@ -47,9 +47,9 @@ QUO_BASE_API const char* GetSetProfileChar(int write, const char* section, const
 
 /** Writes a file back: an empty line and a line "[section]" before each section, "key = value" for each key, in
  * the order of reading, what is new at the end. The disk file is replaced in one step: whatever fails, the old one
- * stays whole. Where nothing can be put in its place but the file itself can be written (a folder without the right
- * to write, a device), it is written in place, with a WARNING entry. Processes do not see each other's changes: of
- * two that save one file the last one wins. Hard links to the file are broken, symbolic ones kept.
+ * stays whole. Where nothing can be put in its place but the file itself can be written (a folder without the
+ * right to write, a device), it is written in place, with a WARNING entry. Processes do not see each other's
+ * changes: of two that save one file the last one wins. Hard links to the file are broken, symbolic ones kept.
  *
  * With null, all files are written, in the order of loading.
  *

@@ -60,7 +60,7 @@ public:
     [[nodiscard]] int callee(int status, int line = __builtin_LINE()) noexcept {
         return leave(status, "Called function returned ERROR", QUO_ERROR_CALL_TREE, line);
     }
-    /** A failure that the contract keeps out of the report. */
+    /** A failure that callers expect, such as a key that is not there: it stays out of the report. */
     [[nodiscard]] int silent(int status) noexcept {
         drop_errno();
         return status;
