@@ -28,8 +28,8 @@ QUO_BASE_API size_t debug_element_size(int type) QUO_NOEXCEPT;
 QUO_BASE_API int write_debug(const char* file_name, const void* data, int type, int first,
                              int second) QUO_NOEXCEPT;
 
-/** Asks the parent process for a progress display: the lines "USE_WAITBAR" and "SET_TITLE: title". Titles are cut
- * at 500 bytes. Returns 0. */
+/** Asks the parent process for a progress display: the lines "USE_WAITBAR" and "SET_TITLE: title". Of a title
+ * at most 499 bytes are sent. Returns 0. */
 QUO_BASE_API int waitbar_open(const char* title) QUO_NOEXCEPT;
 
 /** Tells the progress: the line "SET_WAITBAR: value " with six decimals. The library passes the value on

@@ -179,8 +179,10 @@ QUO_BASE_API int check_fsep(char* path) QUO_NOEXCEPT;
  * at its begin. Null for null. Deliberate: a backslash after the last slash belongs to the name. */
 QUO_BASE_API const char* getFileNameFromPath(const char* path) QUO_NOEXCEPT;
 
-/** Copies a whole file. Always 0: deliberate, nothing is checked or reported. When the source cannot be read or
- * the destination not written, the destination stays as it was; copying a file onto itself leaves it whole. */
+/** Copies a whole file, into the destination in place where no other file can be put there. Always 0, as its
+ * callers expect, and nothing is reported: compare the files to learn whether it worked. When the source cannot be
+ * read or the destination not written, the destination stays as it was; copying a file onto itself leaves it
+ * whole. */
 QUO_BASE_API int copyParameterFile(const char* source, const char* destination) QUO_NOEXCEPT;
 
 QUO_BASE_C_END

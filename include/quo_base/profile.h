@@ -14,8 +14,10 @@ QUO_BASE_C_BEGIN
  *
  * A file is read when it is first named and stays in memory, with all changes, until FreeProfile; changes reach
  * the disk by SyncProfile. Files are known by the exact text of their path: two ways to write one path are two
- * entries. A file that is missing or cannot be read is an empty one. So is a folder, a regular file beyond 1 GiB
- * and a pipe or device that gives more than 64 MiB.
+ * entries. A missing file is an empty one. A file that is there but cannot be read (no right to, no descriptor
+ * left, a read error, a folder, a regular file beyond 1 GiB, a pipe or device that gives more than 64 MiB) looks
+ * empty too, but is never written: what it holds would be lost. In memory a file takes less than eight times its
+ * size.
  *
  * Grammar. There is no comment syntax. Text before the first "[" is skipped. A "[" before an "=" opens a section,
  * even in the middle of a key name; its name runs to the next "]", and the rest of that line is skipped. A key
@@ -45,12 +47,14 @@ QUO_BASE_API const char* GetSetProfileChar(int write, const char* section, const
 
 /** Writes a file back: an empty line and a line "[section]" before each section, "key = value" for each key, in
  * the order of reading, what is new at the end. The disk file is replaced in one step: whatever fails, the old one
- * stays whole.
+ * stays whole. Where nothing can be put in its place but the file itself can be written (a folder without the
+ * right to write, a device), it is written in place, with a WARNING entry. Processes do not see each other's
+ * changes: of two that save one file the last one wins. Hard links to the file are broken, symbolic ones kept.
  *
  * With null, all files are written, in the order of loading.
  *
  * @return With a path: 0 when written or when no such file is in memory; 1 when it cannot be opened for writing,
- * is no regular file, or could not be read whole; -1 when writing failed. With null, deliberately inverted and of
+ * is a folder or pipe, or could not be read; -1 when writing failed. With null, deliberately inverted and of
  * the file loaded last alone: -1 when it was written (or there is none), 0 when it could not be opened or written.
  */
 QUO_BASE_API int SyncProfile(const char* file) QUO_NOEXCEPT;
@@ -84,12 +88,13 @@ QUO_BASE_API void DelProfileSection(const char* section, const char* file) QUO_N
  *
  * Numeric readers take an opening brace or none, then numbers separated by blanks and tabs, and stop at the first
  * word that does not begin with a number or when `count` are read; what follows a number within its word is
- * ignored. Elements read before a failure stay in `values`, the others are not touched. Integers beyond the type's
+ * ignored. Elements read before a failure (status 10: too few) stay in `values`, those after them are not touched;
+ * a key that is not there leaves all as they were. Integers beyond the type's
  * range are read as its nearest bound, numbers beyond the floating range as infinity; every locale reads and
  * writes a point. */
 
 /** Copies a value into `buffer` of `size` bytes, cut to size - 1 and filled up with NUL bytes.
- * A cut keeps UTF-8 sequences whole.
+ * A cut never splits a character that is whole in UTF-8; text in another encoding is cut at that byte.
  * @return 0; 10 when the key is not there or `size` is below 1, with nothing written. */
 QUO_BASE_API int GetMyProfileString(const char* section, const char* key, char* buffer, int size,
                                     const char* file) QUO_NOEXCEPT;
@@ -222,7 +227,7 @@ QUO_BASE_API void GetCheckMyProfileDoubleArray(const char* section, const char* 
  *
  * The arguments in another order; `ignored` is not used. All return 0 or 10 as the functions above do, and leave
  * the same unchanged. The Set forms write and then call SyncProfile(file), so that the change is on the disk at
- * once; they return the status of the write, not of the sync. */
+ * once; they return the status of the write, not of the sync: call SyncProfile(file) to learn whether it is. */
 
 /** Reads a string into `buffer` of 512 bytes; `count` is not used. */
 QUO_BASE_API int GetParString(const char* file, const char* key, int count, char* buffer, int ignored,

@@ -47,8 +47,8 @@ public:
     /** Turns tracking on. */
     quorelReport() noexcept;
     /** Turns tracking on and opens the report `name` (null or empty: "quorelReport.txt") at `level`, 1 to 3;
-     * another level leaves it closed with the name stored. With a name set already it warns as setReportName()
-     * does. */
+     * another level leaves it closed with the name stored. While a report is open it warns as setReportName()
+     * does; after exit_report() it opens the new one. */
     quorelReport(const char* name, int level) noexcept;
 
     /** One entry of the given kind (QuoReportKind) at the given source position, if the report is open. */

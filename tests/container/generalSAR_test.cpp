@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "products.h"
+#include "quo_base/profile.h"
 #include "support/diagnostics.h"
 #include "support/limits.h"
 
@@ -191,6 +192,39 @@ TEST_F(Product, ReadsAnOldParameterFile) {
     EXPECT_EQ(product.pulse.Bandwidth, 15.55e6);
     EXPECT_EQ(product.antennaPattern.PatternSamples, 29);
     EXPECT_EQ(product.dataFile.File.ByteOrder, 1);
+}
+
+// A header in which an object's section was missing stayed among the parameter files in memory: a save of all of
+// them emptied it.
+TEST_F(Product, LeavesNoTraceAmongTheParameterFiles) {
+    const std::string header = file("a"), raster = header.substr(0, header.size() - 4),
+                      older = file("a", "old.hdr");
+    test::write_text(header, kOlderContent);
+    test::write_text(older, "[Pulse]\nBandwidth = 15.55e6\n[PolySAR]\nndc = 1\n");
+    const std::string before = test::read_text(older);
+    FreeProfile(nullptr);
+    ASSERT_NE(GetSetProfileChar(1, "Pulse", "Bandwidth", "17.3e6", older.c_str()), nullptr);
+    GeneralSAR product;
+    polyDC centroid;
+    polyFR rate;
+    geopoint point;
+    for (const std::string& name : {header, older}) {
+        EXPECT_EQ(product.GSread(name.c_str()), 0);
+        for (const GSObject object : test::all_objects()) product.GSget(object)->readhdr(name.c_str());
+        for (const test::Part& part : test::parts_of(product))
+            if (auto* const base = dynamic_cast<GeneralSAR_Base*>(part.object)) base->readhdr(name.c_str());
+        product.swathInfo.readBurstTimes(raster.c_str());
+        centroid.readpar(name.c_str(), "DopplerCentroid-0");
+        centroid.readparold(name.c_str(), "Doppler");
+        rate.readparold(name.c_str(), "Doppler", 7);
+        point.readhdr(name.c_str(), "NorthWest");
+    }
+    EXPECT_EQ(product.pulse.Bandwidth, 17.3e6) << "what is in memory counts";
+    EXPECT_EQ(test::read_text(older), before);
+    EXPECT_EQ(SyncProfile(nullptr), -1);
+    EXPECT_EQ(test::read_text(header), kOlderContent);
+    EXPECT_EQ(test::read_text(older), "\n[Pulse]\nBandwidth = 17.3e6\n\n[PolySAR]\nndc = 1\n");
+    FreeProfile(nullptr);
 }
 
 // Names are text: never a format, and never cut into another message.

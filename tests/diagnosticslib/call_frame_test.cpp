@@ -9,6 +9,7 @@
 #include <functional>
 #include <string>
 #include <utility>
+#include <vector>
 
 #include "tracking.h"
 
@@ -95,6 +96,31 @@ TEST(CallFrame, FailureIsReportedAndPassedOnThroughACallTree) {
     EXPECT_EQ(entries[1].kind + " of " + entries[1].function, "ERROR_CALL_TREE of outer()");
 }
 
+// Entries told the line of the helper, the same for every function that shares it.
+int check_twice(quo::CallerFrame frame, bool good) {
+    return good ? frame.success() : frame.callee(frame.fail(QUO_REFUSED, "Not good"));
+}
+int open_and_fail(const quo::SharedCall& call) {
+    CallFrame frame{call, kSource};
+    errno = ENOENT;
+    return frame.fail(QUO_REFUSED, "Not made");
+}
+TEST(CallFrame, EntriesOfASharedHelperTellTheLineOfItsCall) {
+    test::Report report;
+    const test::CapturedStderr quiet;
+    constexpr int kLine = __LINE__ + 3;
+    {
+        CallFrame frame{"f()", kSource};
+        EXPECT_EQ(check_twice(frame, false), QUO_REFUSED);
+        EXPECT_EQ(open_and_fail("g()"), QUO_REFUSED);
+        EXPECT_EQ(check_twice(frame, true), QUO_OK);
+    }
+    std::vector<std::string> places;
+    for (const auto& entry : report.entries())
+        places.push_back(entry.function + " " + std::to_string(entry.line - kLine));
+    EXPECT_THAT(places, testing::ElementsAre("f() 0", "f() 0", "g() 1", "g() 1"));
+}
+
 // Where errno is looked at, and what is left of it. The entries come in the order in which they were found.
 struct ErrnoCase {
     const char* name;
@@ -128,12 +154,13 @@ const ErrnoCase kErrnoCases[] = {
     {"LeftAtSuccess", 0, ENOSPC, kSucceeds, {kNoRoom}},
     {"Checked", 0, ENOSPC, [](CallFrame& frame) { return frame.check_errno(), frame.success(); }, {kNoRoom}},
     {"Dropped", 0, ENOSPC, [](CallFrame& frame) { return CallFrame::drop_errno(), frame.success(); }, {}},
-    {"AfterTheFailure",
+    // What the system said came after what the function made of it.
+    {"BeforeTheFailure",
      ENOENT,
      ENOSPC,
      [](CallFrame& frame) { return frame.fail(5, "File writing failed!"); },
-     {kNoFile, "File writing failed!", kNoRoom}},
-    {"AfterTheCallTree", 0, ENOSPC, [](CallFrame& frame) { return frame.callee(5); }, {kNoRoom}},
+     {kNoFile, kNoRoom, "File writing failed!"}},
+    {"BeforeTheCallTree", 0, ENOSPC, [](CallFrame& frame) { return frame.callee(5); }, {kNoRoom}},
     {"Silent", 0, ENOSPC, [](CallFrame& frame) { return frame.silent(1); }, {}},
 };
 INSTANTIATE_TEST_SUITE_P(Paths, FrameErrno, testing::ValuesIn(kErrnoCases),

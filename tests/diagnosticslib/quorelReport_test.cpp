@@ -119,6 +119,16 @@ TEST(QuorelReport, OpensByConstructorAndKeepsTheNameOfAnInvalidLevel) {
     report.setLevel(2);
     EXPECT_EQ(report.getLevel(), 2);
     EXPECT_THAT(test::read_text(name), testing::HasSubstr("QUOREL report (level 2) - - -"));
+    const std::string second = folder.file("second.txt");
+    quorelReport{second.c_str(), 3};
+    EXPECT_THAT(test::read_text(name), testing::HasSubstr("Cannot change report FILENAME!"));
+    EXPECT_EQ(test::read_text(second), "");
+    exit_report();
+
+    // The name of the report that was closed stood in the way of every later one.
+    EXPECT_EQ((quorelReport{second.c_str(), 3}.getLevel()), 3);
+    EXPECT_STREQ(report.getReportName(), second.c_str());
+    EXPECT_THAT(test::read_text(second), testing::HasSubstr("QUOREL report (level 3) - - -"));
     exit_report();
 }
 

@@ -83,6 +83,12 @@ TEST_F(SwathFile, RefusesMissingKeys) {
     for (const test::FieldRow& row : kRows)
         contents.push_back(test::profile_text(source, kSection, kRows, row.key));
     for (const std::string& content : contents) EXPECT_EQ(target.readhdr(file(content).c_str()), 1) << content;
+
+    // A missing single value once left the changes unread, beside an array of another length.
+    source.Swst_changes = 3;
+    const std::string changes = "Swst_changes_bursts = {17 29 803}\n";
+    EXPECT_EQ(target.readhdr(file(test::profile_text(source, kSection, kRows, "Rank") + changes).c_str()), 1);
+    EXPECT_THAT(target.Swst_changes_bursts, ElementsAre(17, 29, 803));
 }
 
 // A count far beyond what a file can mean takes no memory.

@@ -3,13 +3,12 @@
 #include <algorithm>
 #include <array>
 #include <cstdint>
-#include <map>
 #include <set>
 #include <string>
 
 #include "list_model.h"
+#include "profilelib/index_table.h"
 #include "profilelib/name_hash.h"
-#include "profilelib/place_table.h"
 
 namespace {
 
@@ -25,28 +24,31 @@ TEST(NameHash, SpreadsNumberedNamesOverTheLowBits) {
     EXPECT_LT(*std::max_element(buckets.begin(), buckets.end()), 144);
 }
 
-// Few hashes for many places: long runs that grow, shrink and wrap around the end of the array.
-TEST(PlaceTable, FindsWhatAMapFinds) {
-    static const std::array<int, 300> things{};
+// Few hashes for many things: long runs that grow, shrink and wrap around the end of the array.
+TEST(IndexTable, FindsWhatASetFinds) {
     for (const std::uint64_t hashes : {1U, 7U, 61U, 1000003U}) {
         test::Dice dice{static_cast<unsigned>(hashes)};
-        quo::PlaceTable<const int*> table;
-        std::map<unsigned, std::uint64_t> model;
+        quo::IndexTable table;
+        std::set<std::uint32_t> model;
+        const auto hash_of = [hashes](std::uint32_t thing) {
+            return (thing * std::uint64_t{2654435761} % hashes) << (thing % 3) << 40;
+        };
         for (int step = 0; step < 6000; ++step) {
-            const unsigned thing = dice.below(step % 2000 < 1000 ? 300 : 40);
-            const auto known = model.find(thing);
-            const std::uint64_t its_hash = (thing * std::uint64_t{2654435761} % hashes) << (thing % 3);
-            const auto found =
-                table.find(its_hash, [thing](const int* place) { return place == &things.at(thing); });
-            ASSERT_EQ(found != nullptr, known != model.end()) << "step " << step << ", " << hashes << " hashes";
+            const std::uint32_t thing = dice.below(step % 2000 < 1000 ? 300 : 40);
+            const auto found = table.find(hash_of(thing), [thing](std::uint32_t index) { return index == thing; });
+            ASSERT_EQ(found != nullptr, model.contains(thing)) << "step " << step << ", " << hashes << " hashes";
             if (found) {
-                ASSERT_EQ(found->place, &things.at(thing));
+                ASSERT_EQ(found->index, thing);
                 table.remove(found);
-                model.erase(known);
-            } else {
-                table.add(its_hash, &things.at(thing));
-                model.emplace(thing, its_hash);
+                model.erase(thing);
+                continue;
             }
+            if (table.is_full()) {
+                table.make_anew();
+                for (const std::uint32_t known : model) table.add(known, hash_of(known));
+            }
+            table.add(thing, hash_of(thing));
+            model.insert(thing);
         }
     }
 }

@@ -1,6 +1,8 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <array>
 #include <cerrno>
@@ -152,13 +154,16 @@ TEST_F(ProfileStore, FolderIsAnEmptyFileThatCannotBeWritten) {
     EXPECT_EQ(sync(""), 1);
 }
 
-TEST_F(ProfileStore, EndlessDeviceIsEmptyAndNotReplaced) {
+TEST_F(ProfileStore, DeviceIsNotReplacedAndAnEndlessOneNotWritten) {
     const std::string link = missing("full.par");
     fs::create_symlink("/dev/full", link);
     EXPECT_EQ(get(link, "k"), nullptr);
     set(link, "k", "v");
     EXPECT_EQ(sync(link), 1);
     EXPECT_TRUE(fs::is_symlink(link) && fs::is_character_file(link));
+    set("/dev/null", "k", "v");
+    EXPECT_EQ(sync("/dev/null"), 0);
+    EXPECT_TRUE(fs::is_character_file("/dev/null"));
 }
 
 // What is too long to be read must not be replaced by the little that is known of it.
@@ -190,9 +195,12 @@ TEST_F(ProfileStore, WhatMayNotBeReadIsEmptyAndWhatMayNotBeWrittenStays) {
     struct Rights {
         mode_t folder, file;
         const char* value;
+        bool saved = false;
     };
-    for (const auto& [folder, mode, value] :
-         {Rights{0555, 0644, "1"}, Rights{0777, 0444, "1"}, Rights{0777, 0, nullptr}}) {
+    // A file that may be written in a folder that may not was refused.
+    for (const auto& [folder, mode, value, saved] : {Rights{0555, 0644, "1"}, Rights{0777, 0444, "1"},
+                                                     Rights{0777, 0, nullptr}, Rights{0555, 0666, "1", true}}) {
+        const test::Report report;
         SCOPED_TRACE(testing::Message() << std::oct << folder << " " << mode);
         const std::string path = file("a.par", "[s]\nk = 1\n");
         chmod(folder_.path().c_str(), folder);
@@ -203,16 +211,66 @@ TEST_F(ProfileStore, WhatMayNotBeReadIsEmptyAndWhatMayNotBeWrittenStays) {
             EXPECT_EQ(errno, 0);
             set(path, "k", "2");
             set(missing(), "k", "2");
-            EXPECT_EQ(sync(path), 1);
+            EXPECT_EQ(sync(path), saved ? 0 : 1);
             EXPECT_EQ(sync(missing()), folder == 0555 ? 1 : 0);
+            EXPECT_EQ(errno, 0);
         }
+        EXPECT_EQ(report.entries("WARNING").size(), saved ? 1U : 0U);
         chmod(folder_.path().c_str(), 0700);
         chmod(path.c_str(), 0600);
-        EXPECT_EQ(read_text(path), "[s]\nk = 1\n");
+        EXPECT_EQ(read_text(path), saved ? "\n[s]\nk = 2\n" : "[s]\nk = 1\n");
         FreeProfile(nullptr);
         fs::remove(missing());
         EXPECT_EQ(entries(), 1);
     }
+}
+
+/** No file can be opened, as in a process that has used up its descriptors. */
+class NoDescriptors {
+public:
+    NoDescriptors() {
+        getrlimit(RLIMIT_NOFILE, &before_);
+        const int next = dup(STDERR_FILENO);
+        close(next);
+        const rlimit limit{static_cast<rlim_t>(next), before_.rlim_max};
+        setrlimit(RLIMIT_NOFILE, &limit);
+    }
+    ~NoDescriptors() { setrlimit(RLIMIT_NOFILE, &before_); }
+    NoDescriptors(const NoDescriptors&) = delete;
+    NoDescriptors& operator=(const NoDescriptors&) = delete;
+
+private:
+    rlimit before_{};
+};
+
+// A file that could not be read counted as empty: a save replaced all of it by the little that was set.
+TEST_F(ProfileStore, WhatCouldNotBeReadIsNotReplaced) {
+    const std::string old = "[s]\nk = 1\n[t]\nj = 2\n", path = file("a.par", old);
+    const auto set_a_key = [&path] {
+        EXPECT_EQ(get(path, "j", "t"), nullptr);
+        EXPECT_STREQ(set(path, "k", "2"), "2");
+        EXPECT_EQ(errno, 0);
+    };
+    chmod(folder_.path().c_str(), 0777);
+    for (const mode_t mode : {0666, 0222}) {
+        SCOPED_TRACE(testing::Message() << std::oct << mode);
+        chmod(path.c_str(), mode);
+        const test::OrdinaryUser user;
+        if (mode == 0666) {
+            const NoDescriptors none;
+            set_a_key();
+        } else {
+            set_a_key();
+        }
+        EXPECT_EQ(sync(path), 1);
+        EXPECT_EQ(SetParInt(path.c_str(), "k", 0, nullptr, 0, "s"), 0) << "the status of the write";
+        EXPECT_EQ(SyncProfile(nullptr), 0);
+        FreeProfile(nullptr);
+    }
+    chmod(path.c_str(), 0600);
+    EXPECT_EQ(read_text(path), old);
+    EXPECT_STREQ(get(path, "j", "t"), "2");
+    EXPECT_EQ(entries(), 1);
 }
 
 TEST_F(ProfileStore, BinaryNoiseLoadsAndStaysStable) {

@@ -14,6 +14,7 @@
 #include "quo_base/gen_utils.h"
 #include "sarutillib/file_io.h"
 #include "support/diagnostics.h"
+#include "support/limits.h"
 
 namespace {
 
@@ -133,6 +134,20 @@ TEST(CopyParameterFile, CopiesEveryByteOrKeepsTheDestinationAndSaysNothing) {
     for (const char* source : {"missing", "", "pipe", "old"}) EXPECT_EQ(copy(source, "old"), 0);
     for (const char* destination : {"no_folder/copy", ""}) EXPECT_EQ(copy("old", destination), 0);
     EXPECT_EQ(copyParameterFile(nullptr, nullptr), 0);
+
+    // Where the folder may not be written but the file may, nothing was copied.
+    const std::string locked = folder.file("locked/copy");
+    std::filesystem::create_directory(folder.file("locked"));
+    write_text(locked, "old");
+    chmod(locked.c_str(), 0666);
+    chmod(folder.file("locked").c_str(), 0555);
+    chmod(folder.path().c_str(), 0755);
+    {
+        const test::OrdinaryUser user;
+        EXPECT_EQ(copy("source", "locked/copy"), 0);
+    }
+    chmod(folder.file("locked").c_str(), 0755);
+    EXPECT_EQ(read_text(locked), content);
     EXPECT_EQ(errno, 0);
     EXPECT_EQ(captured.text(), "");
     EXPECT_TRUE(read_text(folder.file("old")) == content && read_text(folder.file("new")) == content);

@@ -7,6 +7,7 @@
 #include <string>
 
 #include "diagnosticslib/call_frame.h"
+#include "profilelib/profile_look.h"
 #include "quo_base/profile.h"
 #include "quorelxmllib/field_table.h"
 #include "quorelxmllib/header_session.h"
@@ -153,7 +154,8 @@ int each_list(Set& set, See see) {
 }
 
 template <typename P>
-int evaluate_selected(const char* function, const List<P>& list, double range, double azimuth, double* value) {
+int evaluate_selected(const quo::SharedCall& function, const List<P>& list, double range, double azimuth,
+                      double* value) {
     quo::CallFrame frame{function, kSource};
     if (list.empty()) return frame.fail(QUO_NUMERIC, list.quantity().none);
     if (const int status = list.selected(azimuth).EvaluatePoly(range, azimuth, value)) return frame.callee(status);
@@ -165,7 +167,8 @@ double value_around(const double* c, double x, double y) {
 }
 
 template <typename P>
-int evaluate_interpolated(const char* function, const List<P>& list, double range, double azimuth, double* value) {
+int evaluate_interpolated(const quo::SharedCall& function, const List<P>& list, double range, double azimuth,
+                          double* value) {
     quo::CallFrame frame{function, kSource};
     if (list.empty()) return frame.fail(QUO_NUMERIC, list.quantity().none);
     double c[7];
@@ -176,7 +179,7 @@ int evaluate_interpolated(const char* function, const List<P>& list, double rang
 }
 
 template <typename P>
-int get_coefficients(const char* function, const List<P>& list, double azimuth, double* c) {
+int get_coefficients(const quo::SharedCall& function, const List<P>& list, double azimuth, double* c) {
     quo::CallFrame frame{function, kSource};
     if (list.empty()) return frame.fail(QUO_NUMERIC, list.quantity().none);
     list.coefficients(azimuth, c);
@@ -184,7 +187,7 @@ int get_coefficients(const char* function, const List<P>& list, double azimuth, 
 }
 
 template <typename P>
-int get_number(const char* function, const List<P>& list, double azimuth, int* index) {
+int get_number(const quo::SharedCall& function, const List<P>& list, double azimuth, int* index) {
     quo::CallFrame frame{function, kSource};
     if (list.empty()) return frame.fail(QUO_NUMERIC, list.quantity().none);
     *index = static_cast<int>(list.earlier(azimuth));
@@ -252,6 +255,7 @@ int polySL2PHI::readpar(const char* file, const char* name) {
 }
 
 int polyDC::readparold(const char* file, const char* section) {
+    const quo::ProfileLook look{file};
     std::int32_t n = 0;
     double range = trg0, azimuth = taz0, a5[5], a7[7];
     bool found = GetMyProfileIntArray(section, "DopCenPol_nCoeff", &n, 1, file) == QUO_OK;
@@ -270,6 +274,7 @@ int polyDC::readparold(const char* file, const char* section) {
 }
 
 int polyFR::readparold(const char* file, const char* section, int n) {
+    const quo::ProfileLook look{file};
     double a3[3], a5[5], a7[7];
     if (n == 5 && read_doubles(section, "AzimuthCoeff", a5, 5, file)) {
         set_pure_range(pol, a5);
@@ -376,6 +381,7 @@ int polySAR::writehdr(const char* file) {
 int polySAR::readhdr(const char* file) {
     quo::CallFrame frame{"polySAR::readhdr", kSource};
     const quo::JoinedSession session{file};
+    const quo::ProfileLook look{file};
     DestroyPolys();
     if (!readAuxiliaryFile(file, 1, kSetSection) && counts::kTable.read_profile(*this, file) != QUO_OK) {
         DestroyPolys();

@@ -9,6 +9,7 @@
 
 #include "diagnosticslib/call_frame.h"
 #include "generalSAR/annex_file.h"
+#include "profilelib/profile_look.h"
 #include "quo_base/datafile.h"
 #include "quo_base/gen_utils.h"
 #include "quo_base/profile.h"
@@ -262,8 +263,10 @@ int geopoint::writehdr(const char* file, const char* name) {
 }
 int geopoint::readhdr(const char* file, const char* name) {
     // Deliberate: what Point holds becomes the named members even where neither form of the file has the point.
-    if (!readAuxiliaryFile(file, 1, point::section_of(name).c_str()))
+    if (!readAuxiliaryFile(file, 1, point::section_of(name).c_str())) {
+        const quo::ProfileLook look{file};
         GetProfileDoubleArray(point::kProfileSection, name, Point, static_cast<int>(std::size(Point)), file);
+    }
     Latitude = Point[0];
     Longitude = Point[1];
     Height = Point[2];

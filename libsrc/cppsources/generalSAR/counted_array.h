@@ -12,7 +12,7 @@ namespace quo {
 /** Makes the array for a count that a header states: zeros, none for a count below 1. Returns 0, or a reported
  * failure when there are more than `highest` or memory is short; the array is then empty. */
 template <typename T>
-int create_counted_array(CallFrame& frame, std::vector<T>& array, std::int32_t count, std::int32_t highest,
+int create_counted_array(CallerFrame frame, std::vector<T>& array, std::int32_t count, std::int32_t highest,
                          const char* too_many) {
     release_array(array);
     if (count > highest) return frame.fail(QUO_REFUSED, too_many);

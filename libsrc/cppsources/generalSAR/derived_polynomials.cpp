@@ -89,7 +89,7 @@ struct Parabola {
     }
 };
 
-int fit_parabola(quo::CallFrame& frame, const double* x, const double* y, int count, Parabola* fitted) noexcept {
+int fit_parabola(quo::CallerFrame frame, const double* x, const double* y, int count, Parabola* fitted) noexcept {
     if (const int status = polfit(x, y, count, fitted->c, 2)) return frame.callee(status);
     return fitted->finite() ? QUO_OK : frame.fail(QUO_NUMERIC, kNotFinite);
 }
@@ -147,7 +147,7 @@ public:
 
     /** Coefficients around the grid's origin, for the steps of the two axes. The fit runs in units of samples and
      * lines, where its terms are of like weight; a coefficient in seconds is that of the fit over the steps. */
-    int run(quo::CallFrame& frame, const GridValues& values, double x_step, double y_step,
+    int run(quo::CallerFrame frame, const GridValues& values, double x_step, double y_step,
             double (&pol)[kTerms]) const noexcept {
         double a[kTerms + 1]{};
         if (const int status = run_in_steps(values, a)) return frame.callee(status);

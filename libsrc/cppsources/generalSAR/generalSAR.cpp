@@ -2,6 +2,7 @@
 
 #include "diagnosticslib/call_frame.h"
 #include "generalSAR/readable_file.h"
+#include "profilelib/profile_look.h"
 #include "quorelxmllib/header_session.h"
 
 namespace {
@@ -22,6 +23,7 @@ int GeneralSAR::GSread(const char* file) {
     if (const int status = quo::refuse_missing_file(frame, file)) return status;
     GSdestroy();
     const quo::JoinedSession session{file};
+    const quo::ProfileLook look{file};
     for (int i = 0; i < kObjects; ++i) present_[i] = objects_[i]->readhdr(file) == QUO_OK;
     linkObjects();
     return frame.success();

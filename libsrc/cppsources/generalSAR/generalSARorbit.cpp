@@ -11,6 +11,7 @@
 #include "generalSAR/orbit_check.h"
 #include "generalSAR/orbit_model.h"
 #include "generalSAR/orbit_table.h"
+#include "profilelib/profile_look.h"
 #include "quo_base/profile.h"
 
 namespace {
@@ -30,6 +31,7 @@ quo::StateVectors states_of(const Obj& orbit) noexcept {
 
 /** Whether a parameter file tells the times and the number of vectors, but the number is too small. */
 bool lists_too_few(const char* file) noexcept {
+    const quo::ProfileLook look{file};
     double times[2] = {};
     std::int32_t count = 0;
     return file && GetProfileDoubleArray(kTable.section(), "TimeFirst", &times[0], 1, file) == QUO_OK &&

@@ -11,7 +11,7 @@
 namespace quo {
 
 /** 0 when the file can be opened for reading; else the reported status 1, one entry with the file's name. */
-inline int refuse_missing_file(CallFrame& frame, const char* file) {
+inline int refuse_missing_file(CallerFrame frame, const char* file) {
     if (file && Stream{std::fopen(file, "rb")}) return QUO_OK;
     CallFrame::drop_errno();  // the entry says it all
     char message[2048];

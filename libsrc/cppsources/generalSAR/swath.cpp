@@ -7,6 +7,7 @@
 
 #include "diagnosticslib/call_frame.h"
 #include "generalSAR/counted_array.h"
+#include "profilelib/profile_look.h"
 #include "quo_base/gen_utils.h"
 #include "quo_base/profile.h"
 #include "quorelxmllib/field_table.h"
@@ -113,12 +114,12 @@ int Obj::readhdr(const char* file) {
     buffer_status_ = QUO_OK;
     if (readAuxiliaryFile(file, 1, kTable.section())) return QUO_OK;
     if (buffer_status_ == QUO_NO_MEMORY) return QUO_NO_MEMORY;
-    if (kTable.read_profile(*this, file) != QUO_OK) return QUO_REFUSED;
-    if (Swst_changes < 1) return createBuffers();
+    const quo::ProfileLook look{file};
+    const int scalars = kTable.read_profile(*this, file);
     if (const int status = createBuffers()) return status;
-    if (GetMyProfileIntArray(kTable.section(), kChangesKey, Swst_changes_bursts.data(), Swst_changes, file) ==
-        QUO_OK)
-        return QUO_OK;
+    if (Swst_changes < 1 || GetMyProfileIntArray(kTable.section(), kChangesKey, Swst_changes_bursts.data(),
+                                                 Swst_changes, file) == QUO_OK)
+        return scalars;
     freeall_ckerr();
     return QUO_REFUSED;
 }

@@ -15,6 +15,7 @@
 #include <utility>
 #include <vector>
 
+#include "profilelib/profile_look.h"
 #include "quo_base/ckerr.h"
 #include "quo_base/quorelxml_v2.h"
 #include "sarutillib/checked_size.h"
@@ -340,10 +341,12 @@ public:
     }
 
     /** Reads the fields from the parameter file: single values and arrays of fixed size, then createBuffers(),
-     * then the arrays that it made. Every key is read, even after a failure.
+     * then the arrays that it made. Every key is read, even after a failure. The file does not stay among the
+     * parameter files in memory.
      * @return 0; 1, with the pending errors cleared, when a mandatory key failed. */
     int read_profile(Owner& object, const char* file) const { return read_profile(object, file, section_); }
     int read_profile(Owner& object, const char* file, const char* section) const {
+        const ProfileLook look{file};
         bool complete = read_profile_part(object, file, section, false);
         if (has_arrays()) {
             RegistryAccess::set_source(object, file);

@@ -32,7 +32,7 @@ std::atomic<bool> exact_numbers = false;
 
 /** Runs an operation whose only exception is a failed allocation. */
 template <typename Operation>
-int guarded(CallFrame& frame, Operation operation) noexcept {
+int guarded(quo::CallerFrame frame, Operation operation) noexcept {
     try {
         return operation();
     } catch (const std::exception&) {
@@ -40,7 +40,9 @@ int guarded(CallFrame& frame, Operation operation) noexcept {
     }
 }
 
-int out_of_memory(CallFrame& frame) noexcept { return frame.fail(QUO_NO_MEMORY, "Memory allocation failure"); }
+int out_of_memory(quo::CallerFrame frame) noexcept {
+    return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
+}
 
 void print_missing(const char* what) noexcept {
     std::fprintf(stderr, "File not recognized: %s does not exist\n", what);
@@ -48,7 +50,8 @@ void print_missing(const char* what) noexcept {
 
 /** What a reader's report entries need. */
 struct Reading {
-    const char *function, *type;
+    quo::SharedCall function;
+    const char* type;
     int channel;
     const char* field;
 };
@@ -353,7 +356,7 @@ struct quorelxml::Operations {
         char message[2 * kNameRoom + 64];
         quo::format_bounded(message, sizeof message, "Cannot read %s '%s' in channel %d, from XML file %s",
                             reading.type, reading.field, reading.channel, self.file_name_.c_str());
-        quo_add_report(message, QUO_WARNING, __builtin_LINE(), reading.function, kSource);
+        quo_add_report(message, QUO_WARNING, reading.function.line, reading.function.function, kSource);
         return QUO_REFUSED;
     }
 
@@ -370,7 +373,8 @@ struct quorelxml::Operations {
 
     /** Sets the texts of a field's elements, which are made where they are missing. `text_of(i)` is the i-th. */
     template <typename TextOf>
-    static int write(quorelxml& self, CallFrame& frame, int channel, const char* path, int count, TextOf text_of) {
+    static int write(quorelxml& self, quo::CallerFrame frame, int channel, const char* path, int count,
+                     TextOf text_of) {
         if (count < 1) return frame.success();
         if (!quo::is_field_path(path)) return frame.fail(QUO_REFUSED, "Bad field name");
         const auto wanted = static_cast<std::size_t>(count);
@@ -394,7 +398,7 @@ struct quorelxml::Operations {
     }
 
     template <typename T, typename Format>
-    static int write_numbers(quorelxml& self, const char* function, int channel, const char* field,
+    static int write_numbers(quorelxml& self, const quo::SharedCall& function, int channel, const char* field,
                              const T* values, int count, Format format) noexcept {
         CallFrame frame{function, kSource};
         if (!field || (!values && count > 0)) return frame.fail(QUO_REFUSED, "Null argument");

@@ -23,7 +23,7 @@ constexpr const char* kSource = "quorelxml_v2";
 constexpr std::size_t kNameRoom = 512;
 
 template <typename Operation>
-int guarded(CallFrame& frame, Operation operation) noexcept {
+int guarded(quo::CallerFrame frame, Operation operation) noexcept {
     try {
         return operation();
     } catch (const std::exception&) {

@@ -13,6 +13,7 @@
 #include "datafilelib/raster_stream.h"
 #include "datafilelib/sample_kernels.h"
 #include "diagnosticslib/call_frame.h"
+#include "profilelib/profile_look.h"
 #include "quo_base/profile.h"
 #include "sarutillib/bounded_text.h"
 #include "sarutillib/checked_size.h"
@@ -309,6 +310,7 @@ int DataFile::read_hdr(const char* file_name) {
     const std::string side_file = sideFile();
     if (readSection(side_file.c_str()) == QUO_OK) return frame.success();
 
+    const quo::ProfileLook look{side_file.c_str()};
     ProfileForm form{side_file.c_str()};
     std::int32_t offset = static_cast<std::int32_t>(HeaderOffset);
     form.read("HeaderOffset", offset);

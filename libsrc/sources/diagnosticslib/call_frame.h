@@ -11,6 +11,14 @@
 
 namespace quo {
 
+/** A function whose frame is opened by a helper that several share: its name, and the line where it calls the
+ * helper, which its entries tell. Made from the name alone, as the helper's parameter. */
+struct SharedCall {
+    SharedCall(const char* name, int at = __builtin_LINE()) noexcept : function{name}, line{at} {}
+    const char* function;
+    int line;
+};
+
 /** The ceremony of a tracked function: errno is reported and cleared and the name pushed on entry; leaving without
  * success() frees every block that the call and its callees still hold; the name is popped in any case. Nothing is
  * copied, formatted, allocated or written while all goes well. The frame is the function's first local. */
@@ -21,6 +29,11 @@ public:
         : function_{function}, source_{source} {
         check_errno(line);
         call_stack.push(function);
+    }
+    CallFrame(const SharedCall& call, const char* source) noexcept
+        : function_{call.function}, source_{source}, shared_line_{call.line} {
+        check_errno();
+        call_stack.push(function_);
     }
     ~CallFrame() {
         if (!succeeded_) freeall_ckerr();
@@ -47,7 +60,7 @@ public:
     [[nodiscard]] int callee(int status, int line = __builtin_LINE()) noexcept {
         return leave(status, "Called function returned ERROR", QUO_ERROR_CALL_TREE, line);
     }
-    /** A failure that the contract keeps out of the report. */
+    /** A failure that callers expect, such as a key that is not there: it stays out of the report. */
     [[nodiscard]] int silent(int status) noexcept {
         drop_errno();
         return status;
@@ -55,18 +68,37 @@ public:
 
 private:
     [[gnu::cold]] int leave(int status, const char* message, int kind, int line) noexcept {
-        quo_add_report(message, kind, line, function_, source_);
-        check_errno(line);
+        check_errno(line);  // the system's own text first, then what the library makes of it
+        quo_add_report(message, kind, line_of(line), function_, source_);
         return status;
     }
     /** Clears errno as well: the caller's frame would report the same number again. */
     [[gnu::cold]] void report_errno(int line) noexcept {
-        quo_check(errno, line, function_, source_);
+        quo_check(errno, line_of(line), function_, source_);
         errno = 0;
     }
+    [[nodiscard]] int line_of(int line) const noexcept { return shared_line_ != 0 ? shared_line_ : line; }
 
     const char *function_, *source_;
+    int shared_line_ = 0;
     bool succeeded_ = false;
+};
+
+/** A frame in the hands of a helper that functions share: entries tell the line where the helper was called.
+ * Made from the frame itself, as the helper's parameter. */
+class CallerFrame {
+public:
+    CallerFrame(CallFrame& frame, int line = __builtin_LINE()) noexcept : frame_{frame}, line_{line} {}
+
+    [[nodiscard]] int success() const noexcept { return frame_.success(line_); }
+    [[nodiscard]] int fail(int status, const char* message) const noexcept {
+        return frame_.fail(status, message, line_);
+    }
+    [[nodiscard]] int callee(int status) const noexcept { return frame_.callee(status, line_); }
+
+private:
+    CallFrame& frame_;
+    int line_;
 };
 
 /** A zero-filled array from the tracked allocator, released when it goes. Empty when memory could not be had or

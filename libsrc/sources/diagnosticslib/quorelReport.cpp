@@ -72,7 +72,7 @@ quorelReport::quorelReport() noexcept { init_ckerr_locking(); }
 
 quorelReport::quorelReport(const char* name, int level) noexcept {
     init_ckerr_locking();
-    if (reportFilename[0] != '\0') {
+    if (report_is_open()) {
         add_plain(QUO_WARNING, "Cannot change report FILENAME!");
         return;
     }

@@ -203,7 +203,7 @@ private:
     int *row_of_, *column_of_, *used_;
 };
 
-int tracked_gauss_jordan(const char* name, double** a, int n, double** b, int m) {
+int tracked_gauss_jordan(const quo::SharedCall& name, double** a, int n, double** b, int m) {
     quo::CallFrame frame{name, quo::kMatrixSource};
     if (n < 1) return frame.silent(QUO_NUMERIC);
     const auto count = static_cast<std::size_t>(n);

@@ -72,7 +72,7 @@ T* or_end(T* made) {
 }
 
 template <typename T>
-T* make_vector(const char* name, int nl, int nh) {
+T* make_vector(const quo::SharedCall& name, int nl, int nh) {
     const auto build = [&]() -> T* {
         quo::CallFrame frame{name, kSource};
         const auto length = range_length(nl, nh);
@@ -85,7 +85,7 @@ T* make_vector(const char* name, int nl, int nh) {
 }
 
 template <typename T>
-T** make_matrix(const char* name, int nrl, int nrh, int ncl, int nch) {
+T** make_matrix(const quo::SharedCall& name, int nrl, int nrh, int ncl, int nch) {
     const auto build = [&]() -> T** {
         quo::CallFrame frame{name, kSource};
         const auto rows = range_length(nrl, nrh);
@@ -116,7 +116,7 @@ void release_matrix(T** m, int nrl, int ncl) {
 
 // Row pointers over memory of the caller's: row k is `first` moved by k times what `row(k)` tells.
 template <typename Row>
-float** make_row_pointers(const char* name, int low, std::optional<std::int64_t> rows, Row row) {
+float** make_row_pointers(const quo::SharedCall& name, int low, std::optional<std::int64_t> rows, Row row) {
     const auto build = [&]() -> float** {
         quo::CallFrame frame{name, kSource};
         float** block = rows ? make_block<float*>(*rows) : nullptr;

@@ -142,7 +142,8 @@ private:
 };
 
 struct FitName {
-    const char *function, *nothing_to_fit;
+    quo::SharedCall function;
+    const char* nothing_to_fit;
 };
 
 int fit_by_normal_equations(const FitName& name, const WeightedPoints& points, double* a, const int* ia, int ma,

@@ -34,10 +34,10 @@ public:
     }
     /** Stores a value and gives the call's status; a refusal is reported. */
     [[nodiscard]] int store(const char* value, int line = __builtin_LINE()) noexcept {
-        if (GetSetProfileChar(1, section_, key_, value, file_)) return success();
+        if (GetSetProfileChar(1, section_, key_, value, file_)) return success(line);
         return warn("Parameter writing failed", line);
     }
-    [[nodiscard]] int success() noexcept { return frame_.success(); }
+    [[nodiscard]] int success(int line = __builtin_LINE()) noexcept { return frame_.success(line); }
     /** A result that is deliberately not reported. */
     [[nodiscard]] int silent(int status) noexcept { return frame_.silent(status); }
     [[nodiscard]] int too_few(int read, int wanted, int line = __builtin_LINE()) noexcept {
@@ -132,17 +132,17 @@ int scan_list(std::string_view text, Number* values, int count) noexcept {
 }
 
 template <typename Number>
-int read_list(Access& access, Number* values, int count) noexcept {
+int read_list(Access& access, Number* values, int count, int line = __builtin_LINE()) noexcept {
     const char* const text = access.value();
     if (!text) return access.silent(QUO_NUMERIC);
     const int read = scan_list(text, values, values ? count : 0);
-    return read < count ? access.too_few(read, count) : access.success();
+    return read < count ? access.too_few(read, count, line) : access.success(line);
 }
 
 /** Writes element (r, c) from position r + c * rows. */
 template <typename Cell>
-int write_matrix(Access& access, const Cell* cells, int rows, int columns) noexcept {
-    if (!cells && rows > 0 && columns > 0) return access.store(nullptr);
+int write_matrix(Access& access, const Cell* cells, int rows, int columns, int line = __builtin_LINE()) noexcept {
+    if (!cells && rows > 0 && columns > 0) return access.store(nullptr, line);
     ValueText text;
     for (int r = 0; r < rows; ++r) {
         text.append(r == 0 ? "" : kBetweenRows).append("{");
@@ -152,17 +152,17 @@ int write_matrix(Access& access, const Cell* cells, int rows, int columns) noexc
         }
         text.append("}");
     }
-    return access.store(rows > 0 ? text.data() : "{}");
+    return access.store(rows > 0 ? text.data() : "{}", line);
 }
 
 template <typename Cell>
-int write_list(Access& access, const Cell* cells, int count) noexcept {
-    return write_matrix(access, cells, 1, count);
+int write_list(Access& access, const Cell* cells, int count, int line = __builtin_LINE()) noexcept {
+    return write_matrix(access, cells, 1, count, line);
 }
 
 template <typename Number>
-int write_number(Access& access, Number value) noexcept {
-    return access.store(number_text(value).data);
+int write_number(Access& access, Number value, int line = __builtin_LINE()) noexcept {
+    return access.store(number_text(value).data, line);
 }
 
 /** How a scan of a string list ended: strings read, and the character between strings that ended it, or NUL. */
@@ -185,15 +185,15 @@ StringScan scan_strings(std::string_view text, char* const* strings, int count, 
     return {std::max(count, 0), '\0'};
 }
 
-int read_strings(Access& access, char* const* strings, int count, int room) noexcept {
+int read_strings(Access& access, char* const* strings, int count, int room, int line = __builtin_LINE()) noexcept {
     const char* const text = access.value();
     if (!text) return access.silent(QUO_NUMERIC);
     // Deliberate: a value that is no list counts as read.
-    if (*text != '{') return access.success();
+    if (*text != '{') return access.success(line);
     const auto [read, stop] = scan_strings(text + 1, strings, strings ? count : 0, room);
     // Deliberate: an early closing brace gives the count for a status, anything else but a quote a success.
     if (stop == '}' && read > 0) return access.silent(read);
-    return stop == '\0' && read < count ? access.too_few(read, count) : access.success();
+    return stop == '\0' && read < count ? access.too_few(read, count, line) : access.success(line);
 }
 
 }  // namespace

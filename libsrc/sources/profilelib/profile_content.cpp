@@ -1,6 +1,8 @@
 #include "profilelib/profile_content.h"
 
 #include <algorithm>
+#include <cstring>
+#include <stdexcept>
 #include <utility>
 
 #include "profilelib/name_hash.h"
@@ -47,11 +49,23 @@ private:
     std::string_view rest_;
 };
 
+std::uint64_t hash_of(std::string_view section) { return NameHash{}.add(section).value(); }
+/** Hash of a key by its name and by what its section's name is known by. */
+std::uint64_t hash_of(std::uint32_t section, std::string_view name) {
+    char number[sizeof section];
+    std::memcpy(number, &section, sizeof section);
+    return NameHash{}.add({number, sizeof number}).add(name).value();
+}
+
 }  // namespace
 
-void ProfileContent::parse(std::string_view text) {
-    Reader reader{text};
-    SectionPlace section = sections_.end();
+void ProfileContent::parse(std::string text) {
+    if (text.size() >= kOwned) throw std::length_error{"a parameter file beyond 2 GiB"};
+    file_text_ = std::move(text);
+    Reader reader{file_text_};
+    // What is kept never takes more than what was read: each NUL byte stands for a bracket, "=" or line feed.
+    std::size_t end = 0;
+    Index section = kNone;
     reader.take_before('[');
     while (!reader.at_end()) {
         if (reader.next() == '[') {
@@ -59,106 +73,214 @@ void ProfileContent::parse(std::string_view text) {
             const std::string_view name = reader.take_before(']');
             // A bracket that is never closed makes no section: nothing could find it, and it would not be written.
             if (reader.at_end()) return;
-            section = add_section(kept(name));
             reader.pass_line();
+            const auto place = static_cast<Text>(end);
+            keep(kept(name), end);
+            section = add_section(place);
         }
         reader.skip_blanks();
         if (reader.next() == '=') {
             reader.pass_line();
             continue;
         }
-        // Deliberate: a line feed does not end a key name, and a "[" drops what was read of one.
+        // A line feed does not end a key name, and a "[" drops what was read of one: files in use are written so.
         const std::string_view name = reader.take_before("[=");
         if (reader.next() != '=') continue;
         reader.pass();
         const std::string_view value = reader.take_before('\n');
         reader.pass();
-        add_key(section, kept(name), kept(value));
+        const auto place = static_cast<Text>(end);
+        keep(kept(name), end);
+        keep(kept(value), end);
+        add_key(section, place);
     }
 }
 
-std::string ProfileContent::text() const {
-    std::string text;
-    for (const Section& section : sections_) {
-        text.append("\n[").append(section.name).append("]\n");
-        for (const Key& key : section.keys) text.append(key.name).append(" = ").append(key.value).append("\n");
-    }
-    return text;
+void ProfileContent::keep(std::string_view token, std::size_t& end) {
+    std::memmove(file_text_.data() + end, token.data(), token.size());
+    end += token.size();
+    file_text_[end++] = '\0';
 }
 
 const char* ProfileContent::find(std::string_view section, std::string_view key) {
-    const KeySlot* const found = find_key(section, key);
-    return found ? found->place->value.c_str() : nullptr;
+    const Slot* const newest = find_section(section);
+    const Slot* const found = newest ? find_key(sections_[newest->index].text, key) : nullptr;
+    return found ? value_of(found->index) : nullptr;
 }
 
 const char* ProfileContent::set(std::string_view section, std::string_view key, std::string_view value) {
-    const SectionSlot* const known = find_section(section);
-    const SectionPlace newest = known ? known->place : add_section(section);
-    const KeySlot* const found = find_key(section, key);
-    // Deliberate: a key that only an earlier section of the name holds is not changed but hidden by a new one.
-    if (!found || found->place->section != newest) return add_key(newest, key, value);
-    std::string copy{value};
-    found->place->value.swap(copy);
-    return found->place->value.c_str();
+    const Slot* const known = find_section(section);
+    const Index newest = known ? known->index : add_section(own(std::string{section}));
+    const Slot* const found = find_key(sections_[newest].text, key);
+    std::string text{key};
+    text.append(1, '\0').append(value);
+    // A key that only an earlier section of the name holds is not changed but hidden by a new one: programs count
+    // on their values standing in the last section.
+    if (!found || keys_[found->index].section != newest) return value_of(add_key(newest, own(std::move(text))));
+    Text& place = keys_[found->index].text;
+    if (place & kOwned)
+        owned_[place & ~kOwned].swap(text);
+    else
+        place = own(std::move(text));
+    return value_of(found->index);
 }
 
 void ProfileContent::erase_key(std::string_view section, std::string_view key) {
-    const SectionSlot* const newest = find_section(section);
-    KeySlot* const found = find_key(section, key);
-    // Deliberate: earlier sections of the name are not searched.
-    if (found && found->place->section == newest->place) remove_found(found);
+    const Slot* const newest = find_section(section);
+    Slot* const found = newest ? find_key(sections_[newest->index].text, key) : nullptr;
+    // Earlier sections of the name are not searched: each call takes back at most what the last one set.
+    if (!found || keys_[found->index].section != newest->index) return;
+    remove_found(found);
+    sweep();
 }
 
 void ProfileContent::erase_section(std::string_view section) {
-    SectionSlot* const slot = find_section(section);
+    Slot* const slot = find_section(section);
     if (!slot) return;
-    const SectionPlace newest = slot->place;
-    // From the last to the first, each key is the one that a search finds.
-    while (!newest->keys.empty()) remove_found(find_key(section, newest->keys.back().name));
-    if (newest->hidden)
-        slot->place = *newest->hidden;
-    else
+    Section& newest = sections_[slot->index];
+    remove_keys(newest);
+    newest.gone = true;
+    ++removed_;
+    if (newest.hidden != kNone) {
+        slot->index = newest.hidden;
+    } else {
         newest_sections_.remove(slot);
-    sections_.erase(newest);
+        release(newest.text);
+    }
+    sweep();
 }
 
-ProfileContent::SectionSlot* ProfileContent::find_section(std::string_view name) {
-    return newest_sections_.find(NameHash{}.add(name).value(),
-                                 [name](SectionPlace section) { return section->name == name; });
+const char* ProfileContent::at(Text text) const {
+    return text & kOwned ? owned_[text & ~kOwned].c_str() : file_text_.c_str() + text;
 }
 
-ProfileContent::KeySlot* ProfileContent::find_key(std::string_view section, std::string_view name) {
-    return found_keys_.find(NameHash{}.add(section).add(name).value(), [section, name](KeyPlace key) {
-        return key->name == name && key->section->name == section;
+const char* ProfileContent::value_of(Index key) const {
+    const char* const name = at(keys_[key].text);
+    return name + std::strlen(name) + 1;
+}
+
+ProfileContent::Text ProfileContent::own(std::string text) {
+    if (free_owned_.empty()) {
+        owned_.push_back(std::move(text));
+        return kOwned | static_cast<Text>(owned_.size() - 1);
+    }
+    const Text place = free_owned_.back();
+    free_owned_.pop_back();
+    owned_[place & ~kOwned].swap(text);
+    return place;
+}
+
+void ProfileContent::release(Text text) {
+    if (!(text & kOwned)) return;
+    std::string{}.swap(owned_[text & ~kOwned]);  // an assignment would keep the memory
+    free_owned_.push_back(text);
+}
+
+ProfileContent::Slot* ProfileContent::find_section(std::string_view name) {
+    return find_section(name, hash_of(name));
+}
+ProfileContent::Slot* ProfileContent::find_section(std::string_view name, std::uint64_t hash) {
+    return newest_sections_.find(hash, [&](Index section) { return at(sections_[section].text) == name; });
+}
+
+ProfileContent::Slot* ProfileContent::find_key(Text section, std::string_view name) {
+    return find_key(section, name, hash_of(section, name));
+}
+ProfileContent::Slot* ProfileContent::find_key(Text section, std::string_view name, std::uint64_t hash) {
+    return found_keys_.find(hash, [&](Index key) {
+        return at(keys_[key].text) == name && sections_[keys_[key].section].text == section;
     });
 }
 
-ProfileContent::SectionPlace ProfileContent::add_section(std::string_view name) {
-    const SectionPlace section = sections_.insert(sections_.end(), Section{std::string{name}, {}, {}});
-    if (SectionSlot* const slot = find_section(name))
-        section->hidden = std::exchange(slot->place, section);
+// From the last to the first, so that those are found that a search would find.
+void ProfileContent::renew_newest_sections() {
+    newest_sections_.make_anew();
+    for (auto section = static_cast<Index>(sections_.size()); section-- > 0;) {
+        if (sections_[section].gone) continue;
+        const std::string_view name = at(sections_[section].text);
+        const std::uint64_t hash = hash_of(name);
+        if (!find_section(name, hash)) newest_sections_.add(section, hash);
+    }
+}
+void ProfileContent::renew_found_keys() {
+    found_keys_.make_anew();
+    for (auto key = static_cast<Index>(keys_.size()); key-- > 0;) {
+        if (keys_[key].section == kNone) continue;
+        const Text section = sections_[keys_[key].section].text;
+        const std::string_view name = at(keys_[key].text);
+        const std::uint64_t hash = hash_of(section, name);
+        if (!find_key(section, name, hash)) found_keys_.add(key, hash);
+    }
+}
+
+ProfileContent::Index ProfileContent::add_section(Text text) {
+    const auto section = static_cast<Index>(sections_.size());
+    const std::string_view name = at(text);
+    const std::uint64_t hash = hash_of(name);
+    Slot* const slot = find_section(name, hash);
+    const Index hidden = slot ? std::exchange(slot->index, section) : kNone;
+    sections_.push_back({slot ? sections_[hidden].text : text, kNone, hidden});
+    if (slot) return section;
+    if (newest_sections_.is_full())
+        renew_newest_sections();
     else
-        newest_sections_.add(NameHash{}.add(name).value(), section);
+        newest_sections_.add(section, hash);
     return section;
 }
 
-const char* ProfileContent::add_key(SectionPlace section, std::string_view name, std::string_view value) {
-    std::list<Key>& keys = section->keys;
-    const KeyPlace key = keys.insert(keys.end(), Key{section, std::string{name}, std::string{value}, {}});
-    if (KeySlot* const slot = find_key(section->name, name))
-        key->hidden = std::exchange(slot->place, key);
+ProfileContent::Index ProfileContent::add_key(Index section, Text text) {
+    const auto key = static_cast<Index>(keys_.size());
+    const Text named = sections_[section].text;
+    const std::string_view name = at(text);
+    const std::uint64_t hash = hash_of(named, name);
+    Slot* const slot = find_key(named, name, hash);
+    const Index hidden = slot ? std::exchange(slot->index, key) : kNone;
+    keys_.push_back({text, section, key, hidden});
+    Index& last = sections_[section].last;
+    if (last != kNone) keys_[key].next = std::exchange(keys_[last].next, key);
+    last = key;
+    if (slot) return key;
+    if (found_keys_.is_full())
+        renew_found_keys();
     else
-        found_keys_.add(NameHash{}.add(section->name).add(name).value(), key);
-    return key->value.c_str();
+        found_keys_.add(key, hash);
+    return key;
 }
 
-void ProfileContent::remove_found(KeySlot* slot) {
-    const KeyPlace key = slot->place;
-    if (key->hidden)
-        slot->place = *key->hidden;
+void ProfileContent::remove_found(Slot* slot) {
+    Key& key = keys_[slot->index];
+    if (key.hidden != kNone)
+        slot->index = key.hidden;
     else
         found_keys_.remove(slot);
-    key->section->keys.erase(key);
+    release(key.text);
+    key.section = kNone;
+    ++removed_;
+}
+
+void ProfileContent::remove_keys(const Section& section) {
+    // A key goes when a search finds it, after those that hide it; they all stand in this section.
+    all_keys(keys_, section, [&](Index key) {
+        while (keys_[key].section != kNone) remove_found(find_key(section.text, at(keys_[key].text)));
+        return true;
+    });
+}
+
+void ProfileContent::sweep() {
+    constexpr std::size_t kFew = 16;
+    const std::size_t left = sections_.size() + keys_.size() - removed_;
+    if (removed_ < left + kFew) return;
+    std::deque<Section> sections;
+    std::deque<Key> keys;
+    sections_.swap(sections);
+    keys_.swap(keys);
+    newest_sections_ = found_keys_ = {};
+    removed_ = 0;
+    for (const Section& old : sections) {
+        if (old.gone) continue;
+        const Index section = add_section(old.text);
+        all_keys(keys, old, [&](Index key) { return add_key(section, keys[key].text) != kNone; });
+    }
 }
 
 }  // namespace quo

@@ -1,10 +1,14 @@
 #include "profilelib/profile_store.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdint>
 #include <cstdio>
+#include <utility>
 
+#include "diagnosticslib/saved_in_place.h"
 #include "profilelib/out_of_memory.h"
+#include "profilelib/profile_look.h"
 #include "quo_base/profile.h"
 #include "sarutillib/file_io.h"
 
@@ -75,21 +79,44 @@ ProfileStore::File* ProfileStore::find(std::string_view path) {
 
 void ProfileStore::read(File& file) {
     const char* const path = file.path.c_str();
-    const auto text = read_file(path, file_length(path) ? kLongestFile : kLongestStream);
-    if (text) file.content.parse(*text);
+    auto text = read_file(path, file_length(path) ? kLongestFile : kLongestStream);
     if (!text && errno == ENOMEM) end_process(kNoMoreMemory);
-    file.unread = !text && (errno == EFBIG || errno == EIO);
+    file.unread = !text && errno != ENOENT;
+    if (text) file.content.parse(std::move(*text));
     errno = 0;
 }
 
 int ProfileStore::write(const File& file) {
     if (file.unread) return 1;
-    const std::string text = file.content.text();
     AtomicFile target{file.path.c_str()};
     if (!target.good() && errno == ENOMEM) end_process(kNoMemory);
-    const int status = !target.good() ? 1 : target.write(text) && target.commit() ? 0 : -1;
+    if (!target.good()) {
+        errno = 0;
+        return 1;
+    }
+    const bool written = file.content.write([&](std::string_view piece) { return target.write(piece); });
+    const bool saved = written && target.commit();
+    if (saved) warn_if_in_place(target, "SyncProfile", "profile");
     errno = 0;
-    return status;
+    return saved ? 0 : -1;
+}
+
+bool ProfileStore::begin_look(std::string_view path) {
+    if (find(path) || std::ranges::find(looked_into_, path) != looked_into_.end()) return false;
+    looked_into_.push_back(path);
+    return true;
+}
+
+void ProfileStore::end_look() {
+    free(looked_into_.back());
+    looked_into_.pop_back();
+}
+
+ProfileLook::ProfileLook(const char* file) noexcept
+    : begun_{file && or_end_process(kNoMemory, [&] { return ProfileStore::instance().begin_look(file); })} {}
+
+ProfileLook::~ProfileLook() {
+    if (begun_) ProfileStore::instance().end_look();
 }
 
 }  // namespace quo

@@ -5,6 +5,7 @@
 #include <string>
 #include <string_view>
 #include <unordered_map>
+#include <vector>
 
 #include "profilelib/profile_content.h"
 
@@ -29,11 +30,16 @@ public:
     void free(std::string_view path);
     void free_all();
 
+    /** For ProfileLook. True, unless the file is in memory or being looked into already; end_look() then forgets
+     * the file of the last look that began so. `path` stands until then. */
+    bool begin_look(std::string_view path);
+    void end_look();
+
 private:
     struct File {
         std::string path;
         ProfileContent content;
-        bool unread = false;  // it is there, but reading it broke off: what stands in it must not be replaced
+        bool unread = false;  // it may be there but could not be read: what stands in it must not be replaced
     };
 
     File* find(std::string_view path);
@@ -42,7 +48,8 @@ private:
 
     std::list<File> files_;  // in the order of loading
     std::unordered_map<std::string_view, std::list<File>::iterator> by_path_;
-    File* current_ = nullptr;  // the one used last, which most calls ask for again
+    std::vector<std::string_view> looked_into_;  // the innermost last
+    File* current_ = nullptr;                    // the one used last, which most calls ask for again
 };
 
 }  // namespace quo

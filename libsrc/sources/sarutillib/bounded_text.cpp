@@ -12,27 +12,48 @@ namespace {
 
 /** Bytes that a UTF-8 sequence begun by `lead` has; 1 for anything that begins none. */
 std::size_t sequence_length(unsigned char lead) noexcept {
+    if (lead < 0xC2 || lead > 0xF4) return 1;
     if (lead >= 0xF0) return 4;
-    if (lead >= 0xE0) return 3;
-    return lead >= 0xC0 ? 2 : 1;
+    return lead >= 0xE0 ? 3 : 2;
 }
 
 bool continues_sequence(unsigned char byte) noexcept { return (byte & 0xC0) == 0x80; }
 
-/** Length of a cut text without the sequence that the cut left incomplete. Bytes that are no UTF-8 stay. */
-std::size_t whole_sequences(const char* text, std::size_t length) noexcept {
+/** Whether `text` begins with all bytes of a character of `length` bytes. */
+bool begins_whole(std::string_view text, std::size_t length) noexcept {
+    return text.size() >= length && std::ranges::all_of(text.substr(1, length - 1), [](char byte) {
+               return continues_sequence(static_cast<unsigned char>(byte));
+           });
+}
+
+/** Length of a text cut to `length` bytes without the character that the cut splits. One that is not whole in the
+ * text either is no UTF-8, as in Latin-1, and its bytes stay. */
+std::size_t whole_characters(std::string_view text, std::size_t length) noexcept {
     for (std::size_t back = 1; back <= std::min<std::size_t>(3, length); ++back) {
-        const auto byte = static_cast<unsigned char>(text[length - back]);
-        if (!continues_sequence(byte)) return sequence_length(byte) > back ? length - back : length;
+        const std::string_view last = text.substr(length - back);
+        const auto lead = static_cast<unsigned char>(last.front());
+        if (continues_sequence(lead)) continue;
+        const std::size_t wanted = sequence_length(lead);
+        return wanted > back && begins_whole(last, wanted) ? length - back : length;
     }
     return length;
+}
+
+/** The same where what follows the cut is lost: it is taken to go on with the last character. */
+std::size_t whole_formatted(const char* text, std::size_t length) noexcept {
+    constexpr std::size_t kMost = 3;
+    char window[2 * kMost];
+    std::ranges::fill(window, '\x80');
+    const std::size_t seen = std::min(kMost, length);
+    std::copy_n(text + length - seen, seen, window);
+    return length - seen + whole_characters({window, sizeof window}, seen);
 }
 
 }  // namespace
 
 std::size_t copy_bounded(char* to, std::size_t room, std::string_view text) noexcept {
     if (room == 0) return 0;
-    const std::size_t length = text.size() < room ? text.size() : whole_sequences(text.data(), room - 1);
+    const std::size_t length = text.size() < room ? text.size() : whole_characters(text, room - 1);
     if (length > 0) std::memmove(to, text.data(), length);
     to[length] = '\0';
     return length;
@@ -49,7 +70,7 @@ std::size_t format_bounded(char* to, std::size_t room, const char* format, ...) 
     std::size_t length = 0;
     if (wanted >= 0) {
         const auto whole = static_cast<std::size_t>(wanted);
-        length = whole < room ? whole : whole_sequences(to, room - 1);
+        length = whole < room ? whole : whole_formatted(to, room - 1);
     }
     to[length] = '\0';
     errno = error_before;

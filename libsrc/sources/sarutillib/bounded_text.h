@@ -9,7 +9,8 @@
 namespace quo {
 
 /** Copies `text` into `to`, cut to room - 1 characters and always NUL-terminated; room 0 writes nothing.
- * A cut never splits a UTF-8 sequence. Returns the number of characters written. `text` may lie inside `to`. */
+ * A cut never splits a character that is whole in UTF-8; bytes of another encoding are cut where the room ends.
+ * Returns the number of characters written. `text` may lie inside `to`. */
 std::size_t copy_bounded(char* to, std::size_t room, std::string_view text) noexcept;
 
 /** As above, into an array. */

@@ -5,6 +5,7 @@
 
 namespace {
 
+using quo::CallerFrame;
 using quo::CallFrame;
 using quo::Ellipsoid;
 using quo::OrbitState;
@@ -23,15 +24,15 @@ int solve_ground_point(const Vec3& S, const Vec3& V, const RadarLook& look, doub
     return QUO_OK;
 }
 
-int fail_start(CallFrame& frame, int status) noexcept {
+int fail_start(CallerFrame frame, int status) noexcept {
     return frame.fail(status, status == QUO_REFUSED ? "Unusable platform, range, wavelength or ellipsoid"
                                                     : "No ground point at this range and Doppler");
 }
 
 /** Enters what the search of a starting point has to say, where its caller ran the kernel on its own. */
-int report_start(int status) noexcept {
-    CallFrame frame{"gr_pt0", kSource};
-    return fail_start(frame, status);
+int report_start(int status, int line = __builtin_LINE()) noexcept {
+    CallFrame frame{"gr_pt0", kSource, line};
+    return fail_start({frame, line}, status);
 }
 
 }  // namespace

@@ -163,6 +163,8 @@ inline std::optional<DecimalDigits> first_digits(double value, int count) noexce
         const int power = count - 1 - exponent;
         if (!has_power(power)) return std::nullopt;
         const auto scaled = times_ten_to(number, power);
+        // A product of 1 that was cut is a little less: 64 bits then hold nothing before the point.
+        if (scaled.exponent < -63) return std::nullopt;
         const std::uint64_t whole = scaled.mantissa >> -scaled.exponent;
         if (whole >= end) continue;  // one digit more than wanted
         const std::uint64_t half = std::uint64_t{1} << (-scaled.exponent - 1);

@@ -10,7 +10,8 @@ namespace {
 constexpr const char* kSource = R"(..\..\..\binsrc\cutover\sources\interp)";
 
 /** Multiplies every row by exp(i sign phase). */
-int turn(const demodulationPhase& law, double sign, fcomplex* data, int nx, int ny, const char* function) {
+int turn(const demodulationPhase& law, double sign, fcomplex* data, int nx, int ny,
+         const quo::SharedCall& function) {
     quo::CallFrame frame{function, kSource};
     if (!data || !quo::addressable<fcomplex>(nx, ny)) return frame.fail(QUO_REFUSED, "No image or a size below 1");
     quo::TrackedBuffer<fcomplex> turns{static_cast<std::size_t>(nx)};

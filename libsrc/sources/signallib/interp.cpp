@@ -70,7 +70,7 @@ void interpolate_linearly(const Real* in, std::ptrdiff_t outer, std::ptrdiff_t a
 
 /** `parts` numbers of type Real make a sample. */
 template <typename Real>
-int grow_linearly(quo::CallFrame& frame, const Real* in, int nx_in, int ny_in, int nx_out, int ny_out, Real* out,
+int grow_linearly(quo::CallerFrame frame, const Real* in, int nx_in, int ny_in, int nx_out, int ny_out, Real* out,
                   int parts) {
     if (nx_out <= nx_in && ny_out <= ny_in) return frame.success();
     if (!in || !out || !quo::addressable<dcomplex>(nx_in, ny_in) || !quo::addressable<dcomplex>(nx_out, ny_out))
