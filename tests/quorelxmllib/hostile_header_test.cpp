@@ -238,24 +238,31 @@ TEST(HostileHeaderFile, NeverReplacesAFileThatDoesNotFitIntoMemory) {
     EXPECT_TRUE(quo::read_file(file.c_str(), 200'000'000) == text);
 }
 
-// A pipe has no length to look at beforehand.
+// A pipe has no length to look at beforehand; a file has, and is not read at all. What is too large stays.
 TEST(HostileHeaderFile, IsNotReadBeyondTheLimit) {
     const test::TemporaryFolder folder;
+    const test::Report report;
     const test::CapturedStderr quiet;
-    const std::string file = folder.file("pipe");
-    ASSERT_EQ(mkfifo(file.c_str(), 0600), 0);
+    const std::string pipe_name = folder.file("pipe"), file = folder.file("large.xml");
+    ASSERT_EQ(mkfifo(pipe_name.c_str(), 0600), 0);
     std::signal(SIGPIPE, SIG_IGN);
     std::int64_t taken = 0;
     std::thread writer{[&] {
         const std::string blanks(1 << 20, ' ');
-        const int pipe = open(file.c_str(), O_WRONLY);
-        for (ssize_t done = 0; done >= 0 && taken < 400 << 20; taken += done)
+        const int pipe = open(pipe_name.c_str(), O_WRONLY);
+        for (ssize_t done = 0; done >= 0 && taken < 2 * quorelxml::kMostFileBytes; taken += done)
             done = write(pipe, blanks.data(), blanks.size());
         close(pipe);
     }};
-    EXPECT_EQ(quorelxml{}.initXmlFile(file.c_str()), 7);
+    EXPECT_EQ(quorelxml{}.initXmlFile(pipe_name.c_str()), 7);
     writer.join();
-    EXPECT_LT(taken, 300 << 20);
+    EXPECT_LT(taken, quorelxml::kMostFileBytes + (16 << 20));
+
+    write_text(file, Shelf::text());
+    std::filesystem::resize_file(file, static_cast<std::uintmax_t>(quorelxml::kMostFileBytes) + 1);
+    EXPECT_EQ(quorelxml{}.setDescription(file.c_str(), "New"), 7);
+    EXPECT_THAT(report.messages("ERROR"), testing::Contains("Header file " + file + " is larger than 1 GiB"));
+    EXPECT_EQ(std::filesystem::file_size(file), static_cast<std::uintmax_t>(quorelxml::kMostFileBytes) + 1);
 }
 
 }  // namespace

@@ -1,18 +1,32 @@
 #include "document.h"
 
+#include <cstdint>
 #include <filesystem>
+#include <fstream>
 
 #include "failure.h"
 
 namespace tool {
 
-Document::Document(const std::string& file) : file_{file} {
+void require_header_file(const std::string& file) {
+    static_assert(quorelxml::kMostFileBytes == 1LL << 30);
     std::error_code error;
     const auto kind = std::filesystem::status(file, error).type();
     if (kind == std::filesystem::file_type::not_found) throw Failure(file + ": no such file");
+    if (kind == std::filesystem::file_type::none) throw Failure(file + ": " + error.message());
     if (kind != std::filesystem::file_type::regular) throw Failure(file + ": not a regular file");
+    if (!std::ifstream{file}) throw Failure(file + ": " + system_cause());
+    if (std::filesystem::file_size(file, error) > static_cast<std::uintmax_t>(quorelxml::kMostFileBytes))
+        throw Failure(file + ": is larger than 1 GiB, the limit of a header");
+}
+
+Document::Document(const std::string& file) : file_{file} {
+    require_header_file(file);
     storeFileName(file.c_str());
-    if (parse() != QUO_OK || !isRecognized()) throw Failure(file + ": is no header document");
+    const int status = parse();
+    if (status == QUO_READ_FAILED) throw Failure(file + ": cannot be read");
+    if (status == QUO_NO_MEMORY) throw Failure(file + ": does not fit into memory");
+    if (status != QUO_OK || !isRecognized()) throw Failure(file + ": is no header document");
 }
 
 bool Document::in(const std::string& file) {

@@ -2,6 +2,7 @@
 
 #include <fcntl.h>
 #include <libxml/parser.h>
+#include <libxml/parserInternals.h>
 #include <libxml/xmlerror.h>
 #include <libxml/xmlsave.h>
 #include <sys/stat.h>
@@ -13,7 +14,7 @@
 #include <new>
 #include <utility>
 
-#include "quo_base/api.h"
+#include "quo_base/quorelxml_v2.h"
 #include "sarutillib/file_io.h"
 #include "sarutillib/number_text.h"
 
@@ -24,10 +25,18 @@ constexpr const char* kRoot = "QuorelXmlDoc";
 constexpr const char* kChannel = "Channel";
 constexpr const char* kNumber = "Number";
 
-// A tree takes up to thirty times the memory of its text; the largest headers have a few megabytes.
-constexpr std::int64_t kMostBytes = 256LL << 20;
+constexpr std::int64_t kMostBytes = quorelxml::kMostFileBytes;
 
 const xmlChar* xml(const char* text) { return reinterpret_cast<const xmlChar*>(text); }
+
+/** An element without content, rather than with an empty one: an empty text node would be written as <a></a> and
+ * stop the indentation. Null when memory is short, also for the name alone. */
+xmlNode* new_element(xmlDoc* tree, const char* name) {
+    xmlNode* node = xmlNewDocNode(tree, nullptr, xml(name), nullptr);
+    if (node && node->name) return node;
+    xmlFreeNode(node);
+    return nullptr;
+}
 
 /** While it lives, libxml2 prints nothing on this thread, and a lack of memory is noted, which later errors hide.
  */
@@ -55,6 +64,7 @@ private:
 struct Source {
     Descriptor file;
     std::int64_t bytes = 0;
+    int error = 0;  // the first failure of a system call
     bool too_long = false;
 };
 
@@ -64,6 +74,7 @@ int read_source(void* context, char* buffer, int length) {
     do got = ::read(source.file.get(), buffer, static_cast<std::size_t>(length));
     while (got < 0 && errno == EINTR);
     if (got > 0) source.bytes += got;
+    if (got < 0 && source.error == 0) source.error = errno;
     source.too_long = source.bytes > kMostBytes;
     return source.too_long ? -1 : static_cast<int>(got);
 }
@@ -96,20 +107,34 @@ int parse(XmlTree& tree, Read read) {
     const XmlErrors errors;
     const auto parser = make_parser();
     if (!parser) return QUO_NO_MEMORY;
+    errno = 0;
     tree.reset(read(parser.get()));
     // A text that is too long counts as a lack of memory too; what fails without an error never got to parse.
     const bool unexplained = !tree && parser->errNo == XML_ERR_OK;
     if (errors.out_of_memory() || unexplained) return QUO_NO_MEMORY;
     // A parser that was stopped hands over the part that it has and calls it well-formed.
-    return tree && !parser->disableSAX ? QUO_OK : QUO_REFUSED;
+    if (tree && !parser->disableSAX) return QUO_OK;
+    // The dictionary of names says nothing when it cannot grow: the parser takes the name for a missing one.
+    const bool names_do_not_fit = xmlDictGetUsage(parser->dict) > XML_MAX_DICTIONARY_LIMIT;
+    return errno == ENOMEM || names_do_not_fit ? QUO_NO_MEMORY : QUO_REFUSED;
+}
+
+/** The status of a file that a system call failed on: whatever is not certain to be absent may be whole. */
+int unread(int error) noexcept {
+    errno = error;
+    if (error == ENOENT || error == ENOTDIR) return QUO_REFUSED;
+    return error == ENOMEM || error == EFBIG ? QUO_NO_MEMORY : QUO_READ_FAILED;
 }
 
 int open_source(const char* file, Source& source) {
-    source.file = Descriptor{::open(file, O_RDONLY | O_CLOEXEC)};
-    if (!source.file) return errno == ENOMEM ? QUO_NO_MEMORY : QUO_REFUSED;
+    int number = -1;
+    do number = ::open(file, O_RDONLY | O_CLOEXEC);
+    while (number < 0 && errno == EINTR);
+    source.file = Descriptor{number};
     struct stat found {};
-    const bool usable = ::fstat(source.file.get(), &found) == 0 && !S_ISDIR(found.st_mode);
-    return usable ? QUO_OK : QUO_REFUSED;
+    if (!source.file || ::fstat(source.file.get(), &found) != 0) return unread(errno);
+    if (S_ISDIR(found.st_mode)) return unread(EISDIR);
+    return found.st_size > kMostBytes ? unread(EFBIG) : QUO_OK;
 }
 
 }  // namespace
@@ -121,23 +146,37 @@ int HeaderDocument::load(const char* file, std::shared_ptr<HeaderDocument>& docu
     const int status = parse(tree, [&](xmlParserCtxt* parser) {
         return xmlCtxtReadIO(parser, read_source, nullptr, &source, nullptr, nullptr, kOptions);
     });
-    if (source.too_long) return QUO_NO_MEMORY;
+    if (source.too_long) return unread(EFBIG);
+    if (source.error != 0) return unread(source.error);
     if (status != QUO_OK) return status;
     document = std::make_shared<HeaderDocument>(tree.get(), source.bytes);
     (void)tree.release();
     return QUO_OK;
 }
 
-std::shared_ptr<HeaderDocument> HeaderDocument::create() {
+int HeaderDocument::load_or_create(const char* file, std::shared_ptr<HeaderDocument>& document) {
+    const int status = load(file, document);
+    if (status == QUO_NO_MEMORY || (document && document->is_header())) return status;
+    const int error = errno;
+    const bool unreadable = status == QUO_READ_FAILED;
+    document = create(unreadable);
+    errno = error;
+    if (!document) return QUO_NO_MEMORY;
+    return unreadable ? status : QUO_OK;
+}
+
+std::shared_ptr<HeaderDocument> HeaderDocument::create(bool stands_in) {
     XmlTree tree{xmlNewDoc(xml("1.0"))};
-    xmlNode* root = tree ? xmlNewDocNode(tree.get(), nullptr, xml(kRoot), nullptr) : nullptr;
+    xmlNode* root = tree ? new_element(tree.get(), kRoot) : nullptr;
     if (!root) return nullptr;
     xmlDocSetRootElement(tree.get(), root);
-    if (!xmlNewTextChild(root, nullptr, xml("NumberOfChannels"), xml("0")) ||
-        !xmlNewTextChild(root, nullptr, xml("Description"), xml("My description")))
-        return nullptr;
     auto document = std::make_shared<HeaderDocument>(tree.get(), -1);
     (void)tree.release();
+    document->stands_in_ = stands_in;
+    for (const auto& [name, text] : {std::pair{"NumberOfChannels", "0"}, {"Description", "My description"}}) {
+        xmlNode* element = document->append(root, name);
+        if (!element || !document->set_text(element, text)) return nullptr;
+    }
     return document;
 }
 
@@ -207,6 +246,7 @@ XmlTree reloaded(xmlDoc* tree) {
 }  // namespace
 
 bool HeaderDocument::save(const char* file) {
+    if (stands_in_) return false;
     const XmlErrors errors;
     Sink sink{file};
     if (!sink.good()) return false;
@@ -223,21 +263,32 @@ bool HeaderDocument::save(const char* file) {
     // xmlSaveFormatFileEnc.
     xmlOutputBuffer* output = xmlOutputBufferCreateIO(write_sink, nullptr, &sink, nullptr);
     if (!output) return false;
-    return xmlSaveFormatFileTo(output, tree_.get(), "UTF-8", 1) >= 0 && sink.commit();
+    // The serializer goes on, without the bytes that did not fit into its buffer, when memory runs out.
+    const bool written = xmlSaveFormatFileTo(output, tree_.get(), "UTF-8", 1) >= 0 && !errors.out_of_memory();
+    return written && sink.commit();
 }
 
 // --- looking up -------------------------------------------------------------------------------------------------
 
-NodeText::NodeText(xmlNode* node) noexcept {
-    const xmlNode* child = node->children;
-    if (!child) return;
-    const bool is_text = child->type == XML_TEXT_NODE || child->type == XML_CDATA_SECTION_NODE;
-    const xmlChar* text = is_text && !child->next ? child->content : nullptr;
-    if (!text) {
-        copy_.reset(xmlNodeGetContent(node));
-        text = copy_.get();
+namespace {
+
+bool is_text(const xmlNode* node) { return node->type == XML_TEXT_NODE || node->type == XML_CDATA_SECTION_NODE; }
+
+void append_texts(const xmlNode* parent, std::string& text) {
+    for (const xmlNode* node = parent->children; node; node = node->next) {
+        if (is_text(node) && node->content) text += reinterpret_cast<const char*>(node->content);
+        if (node->type == XML_ELEMENT_NODE) append_texts(node, text);
     }
-    if (text) text_ = reinterpret_cast<const char*>(text);
+}
+
+}  // namespace
+
+NodeText::NodeText(const xmlNode* node) {
+    const xmlNode* child = node->children;
+    if (child && is_text(child) && !child->next)
+        in_place_ = reinterpret_cast<const char*>(child->content);
+    else
+        append_texts(node, copy_);
 }
 
 bool is_named(const xmlNode* node, std::string_view name) noexcept {
@@ -374,14 +425,10 @@ xmlNode* HeaderDocument::append(xmlNode* parent, std::string_view name) {
     // Blanks that were the whole text of an element would keep its new children from being indented.
     if (parent->children && parent->children == parent->last && xmlIsBlankNode(parent->children))
         unlink(parent->children);
-    // No content, rather than an empty one: an empty text node would be written as <a></a> and stop the
-    // indentation.
-    xmlNode* node = xmlNewChild(parent, nullptr, xml(std::string{name}.c_str()), nullptr);
-    if (node && !node->name) {  // made while memory ran out
-        unlink(node);
-        return nullptr;
-    }
-    if (node) note_appended(parent, node);
+    xmlNode* node = new_element(tree_.get(), std::string{name}.c_str());
+    if (!node) return nullptr;
+    xmlAddChild(parent, node);
+    note_appended(parent, node);
     return node;
 }
 
