@@ -7,6 +7,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <string>
 #include <string_view>
@@ -29,11 +30,11 @@
  * refused.
  *
  * Headers are read without network access, without entity substitution and without loading of DTDs; a document
- * that declares anything in a DTD of its own or nests deeper than 256 elements counts as no header. A text above ten
- * million bytes, names above ten million bytes in all, a file above 1 GiB and a real lack of memory give 7, and the
- * file is never replaced by a fresh document. Nor is one that is there but cannot be opened or read (no rights, no
- * free descriptor, a failing disk): a fresh document stands in for it in memory, and saving that gives 1. File names
- * hold at most 511 bytes; a longer one is refused, never cut.
+ * that declares anything in a DTD of its own or nests deeper than 256 elements counts as no header. A text above
+ * ten million bytes, names above ten million bytes in all, a file above 1 GiB and a real lack of memory give 7,
+ * and the file is never replaced by a fresh document. Nor is one that is there but cannot be opened or read (no
+ * rights, no free descriptor, a failing disk): a fresh document stands in for it in memory, and saving that
+ * gives 1. File names hold at most 511 bytes; a longer one is refused, never cut.
  *
  * Operations return 0, 1 (refused: missing field, bad argument, file that cannot be read or saved) or 7 (out of
  * memory) unless said otherwise. One object serves one thread at a time. */
@@ -89,6 +90,17 @@ public:
     int readString(int channel, const char* field, char* const* values, int count) noexcept;
     /** As above, every text cut to `room` - 1 bytes (never inside a UTF-8 character). */
     int readString(int channel, const char* field, char* const* values, int count, std::size_t room) noexcept;
+
+    /** Calls `see` with the whole text of every element that a field path leads to, in document order. 0, also
+     * where there is none; 7. */
+    int readTexts(int channel, const char* field, const std::function<void(std::string_view)>& see) noexcept;
+    /** Calls `see` with the text of every element that a field path leads to, in the order of the file, while the
+     * file is being read: no document is kept, so that arrays of any length take no memory. What was seen counts
+     * only when 0 comes back.
+     * @return 0, also where no element bears the path; 1 when the file is missing or no header document; 4 when it
+     * is there but cannot be read; 7 */
+    static int readTexts(const char* file_name, int channel, const char* field,
+                         const std::function<void(std::string_view)>& see) noexcept;
 
     /** Writes `count` values of a field into the document in memory, creating channel and elements as needed;
      * write() saves them. Of elements beyond `count` none is removed. A count below 1 writes nothing.

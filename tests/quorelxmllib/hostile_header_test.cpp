@@ -49,6 +49,23 @@ std::string laughs() {
     return with_declarations(declarations, "&a39;");
 }
 
+/** The texts of a field as they pass while a file is read; none when that fails, with 1. */
+std::vector<std::string> passing_texts(const std::string& file, const char* field) {
+    std::vector<std::string> texts;
+    const int status =
+        quorelxml::readTexts(file.c_str(), 1, field, [&](std::string_view text) { texts.emplace_back(text); });
+    EXPECT_TRUE(status == 0 || status == 1) << status;
+    return status == 0 ? texts : std::vector<std::string>{};
+}
+/** The same from the document in memory. */
+std::vector<std::string> kept_texts(const std::string& file, const char* field) {
+    std::vector<std::string> texts;
+    EXPECT_EQ(
+        OpenDocument{file.c_str()}.readTexts(1, field, [&](std::string_view text) { texts.emplace_back(text); }),
+        0);
+    return texts;
+}
+
 std::vector<Hostile> hostile_files() {
     const std::string good = Shelf::text();
     const auto spliced = [&](const std::string& part) {
@@ -102,6 +119,7 @@ TEST(HostileHeaderFile, ReadsAsAFreshDocument) {
         double value = -17.3;
         EXPECT_EQ(document.readDouble(1, "Shelf/width", &value, 1), 1);
         EXPECT_EQ(value, -17.3);
+        EXPECT_EQ(quorelxml::readTexts(file.c_str(), 1, "Shelf/width", [](std::string_view) {}), 1);
 
         Shelf object, fresh;
         EXPECT_FALSE(object.readAuxiliaryFile(file.c_str(), 1, "Shelf"));
@@ -113,6 +131,20 @@ TEST(HostileHeaderFile, ReadsAsAFreshDocument) {
         EXPECT_TRUE(fresh.readAuxiliaryFile(file.c_str(), 1, "Shelf"));
         EXPECT_TRUE(object == fresh);
     }
+}
+
+TEST(HostileHeaderFile, PassesByWithTheTextsOfTheDocument) {
+    const test::TemporaryFolder folder;
+    const std::string file = folder.file("header.xml");
+    write_text(file, header_text("<a> </a><a>1<!-- -->2<b>3</b></a><a/><x:a xmlns:x='u'>4</x:a><c><a>5</a></c>"
+                                 "</Channel><Channel Number='2'><a>6</a></Channel><Channel Number='1'>"
+                                 "<a><![CDATA[<7>]]>&amp;</a><a><a>8</a></a>"));
+    for (const char* field : {"a", "a/a", "c/a", "a/b", "", "/", "a/", "none", "c//a"}) {
+        SCOPED_TRACE(field);
+        EXPECT_EQ(passing_texts(file, field), kept_texts(file, field));
+    }
+    EXPECT_THAT(passing_texts(file, "a"), testing::ElementsAre(" ", "123", "", "<7>&", "8"));
+    EXPECT_EQ(quorelxml::readTexts(folder.path().c_str(), 1, "a", [](std::string_view) {}), 4);
 }
 
 TEST(HostileHeaderFile, IsAcceptedWithADoctypeThatDeclaresNothing) {
@@ -150,6 +182,8 @@ TEST(HostileHeaderFile, SurvivesEveryChangedByte) {
         std::string changed = text;
         changed[place] = "<9\xFF"[place % 3];
         write_text(file, changed);
+        for (const char* field : {"Shelf", "Shelf/pages/val", "Shelf/label"})
+            EXPECT_EQ(passing_texts(file, field), kept_texts(file, field)) << place;
         Shelf object, again;
         if (!object.readAuxiliaryFile(file.c_str(), 1, "Shelf") || ++read % 16 != 0) continue;
         EXPECT_EQ(object.writeAuxiliaryFile(file.c_str(), 1, "Shelf"), 0);

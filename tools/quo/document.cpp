@@ -3,6 +3,7 @@
 #include <cstdint>
 #include <filesystem>
 #include <fstream>
+#include <string_view>
 
 #include "failure.h"
 
@@ -37,16 +38,11 @@ bool Document::in(const std::string& file) {
 
 std::vector<std::string> Document::values(const std::string& field) {
     const std::string path = is_array(field) ? field + "/val" : field;
-    const int number = count(path);
-    if (number < 1) throw Failure(file_ + ": has no field " + field);
-    std::vector<std::vector<char>> rooms(static_cast<std::size_t>(number), std::vector<char>(kTextRoom));
-    std::vector<char*> texts;
-    texts.reserve(rooms.size());
-    for (auto& room : rooms) texts.push_back(room.data());
-    if (readString(kChannel, path.c_str(), texts.data(), number, kTextRoom) != QUO_OK) {
-        throw Failure(file_ + ": cannot read " + field);
-    }
-    return {texts.begin(), texts.end()};
+    std::vector<std::string> texts;
+    const int status = readTexts(kChannel, path.c_str(), [&](std::string_view text) { texts.emplace_back(text); });
+    if (status != QUO_OK) throw Failure(file_ + ": cannot read " + field);
+    if (texts.empty()) throw Failure(file_ + ": has no field " + field);
+    return texts;
 }
 
 void Document::replace(const std::string& field, const std::vector<std::string>& values) {

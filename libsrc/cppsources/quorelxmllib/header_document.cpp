@@ -1,12 +1,8 @@
 #include "quorelxmllib/header_document.h"
 
-#include <fcntl.h>
 #include <libxml/parser.h>
 #include <libxml/parserInternals.h>
-#include <libxml/xmlerror.h>
 #include <libxml/xmlsave.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
@@ -14,7 +10,8 @@
 #include <new>
 #include <utility>
 
-#include "quo_base/quorelxml_v2.h"
+#include "quo_base/api.h"
+#include "quorelxmllib/header_source.h"
 #include "sarutillib/file_io.h"
 #include "sarutillib/number_text.h"
 
@@ -24,8 +21,6 @@ namespace {
 constexpr const char* kRoot = "QuorelXmlDoc";
 constexpr const char* kChannel = "Channel";
 constexpr const char* kNumber = "Number";
-
-constexpr std::int64_t kMostBytes = quorelxml::kMostFileBytes;
 
 const xmlChar* xml(const char* text) { return reinterpret_cast<const xmlChar*>(text); }
 
@@ -38,46 +33,7 @@ xmlNode* new_element(xmlDoc* tree, const char* name) {
     return nullptr;
 }
 
-/** While it lives, libxml2 prints nothing on this thread, and a lack of memory is noted, which later errors hide.
- */
-class XmlErrors {
-public:
-    XmlErrors() noexcept : handler_{xmlStructuredError}, context_{xmlStructuredErrorContext} {
-        xmlSetStructuredErrorFunc(this, [](void* self, xmlError* error) {
-            if (error->code == XML_ERR_NO_MEMORY) static_cast<XmlErrors*>(self)->out_of_memory_ = true;
-        });
-    }
-    ~XmlErrors() { xmlSetStructuredErrorFunc(context_, handler_); }
-    XmlErrors(const XmlErrors&) = delete;
-    XmlErrors& operator=(const XmlErrors&) = delete;
-
-    [[nodiscard]] bool out_of_memory() const noexcept { return out_of_memory_; }
-
-private:
-    xmlStructuredErrorFunc handler_;
-    void* context_;
-    bool out_of_memory_ = false;
-};
-
 // --- reading ----------------------------------------------------------------------------------------------------
-
-struct Source {
-    Descriptor file;
-    std::int64_t bytes = 0;
-    int error = 0;  // the first failure of a system call
-    bool too_long = false;
-};
-
-int read_source(void* context, char* buffer, int length) {
-    auto& source = *static_cast<Source*>(context);
-    ssize_t got = 0;
-    do got = ::read(source.file.get(), buffer, static_cast<std::size_t>(length));
-    while (got < 0 && errno == EINTR);
-    if (got > 0) source.bytes += got;
-    if (got < 0 && source.error == 0) source.error = errno;
-    source.too_long = source.bytes > kMostBytes;
-    return source.too_long ? -1 : static_cast<int>(got);
-}
 
 void stop(void* parser) { xmlStopParser(static_cast<xmlParserCtxt*>(parser)); }
 
@@ -99,8 +55,6 @@ std::unique_ptr<xmlParserCtxt, decltype(&xmlFreeParserCtxt)> make_parser() {
     return {parser, &xmlFreeParserCtxt};
 }
 
-constexpr int kOptions = XML_PARSE_NOBLANKS | XML_PARSE_COMPACT | XML_PARSE_NONET;
-
 /** Parses with `read(parser)`. 0, 1 for what is no XML that we accept, or 7. */
 template <typename Read>
 int parse(XmlTree& tree, Read read) {
@@ -119,37 +73,18 @@ int parse(XmlTree& tree, Read read) {
     return errno == ENOMEM || names_do_not_fit ? QUO_NO_MEMORY : QUO_REFUSED;
 }
 
-/** The status of a file that a system call failed on: whatever is not certain to be absent may be whole. */
-int unread(int error) noexcept {
-    errno = error;
-    if (error == ENOENT || error == ENOTDIR) return QUO_REFUSED;
-    return error == ENOMEM || error == EFBIG ? QUO_NO_MEMORY : QUO_READ_FAILED;
-}
-
-int open_source(const char* file, Source& source) {
-    int number = -1;
-    do number = ::open(file, O_RDONLY | O_CLOEXEC);
-    while (number < 0 && errno == EINTR);
-    source.file = Descriptor{number};
-    struct stat found {};
-    if (!source.file || ::fstat(source.file.get(), &found) != 0) return unread(errno);
-    if (S_ISDIR(found.st_mode)) return unread(EISDIR);
-    return found.st_size > kMostBytes ? unread(EFBIG) : QUO_OK;
-}
-
 }  // namespace
 
 int HeaderDocument::load(const char* file, std::shared_ptr<HeaderDocument>& document) {
-    Source source;
-    if (const int status = open_source(file, source)) return status;
+    HeaderSource source;
+    if (const int status = source.open(file)) return status;
     XmlTree tree;
     const int status = parse(tree, [&](xmlParserCtxt* parser) {
-        return xmlCtxtReadIO(parser, read_source, nullptr, &source, nullptr, nullptr, kOptions);
+        return xmlCtxtReadIO(parser, HeaderSource::read, nullptr, &source, nullptr, nullptr, kHeaderOptions);
     });
-    if (source.too_long) return unread(EFBIG);
-    if (source.error != 0) return unread(source.error);
+    if (const int failed = source.status()) return failed;
     if (status != QUO_OK) return status;
-    document = std::make_shared<HeaderDocument>(tree.get(), source.bytes);
+    document = std::make_shared<HeaderDocument>(tree.get(), source.bytes());
     (void)tree.release();
     return QUO_OK;
 }
@@ -237,7 +172,7 @@ XmlTree reloaded(xmlDoc* tree) {
     XmlTree again;
     const int status = parse(again, [&](xmlParserCtxt* parser) -> xmlDoc* {
         return text ? xmlCtxtReadMemory(parser, reinterpret_cast<const char*>(text), size, nullptr, nullptr,
-                                        kOptions)
+                                        kHeaderOptions)
                     : nullptr;
     });
     return status == QUO_OK ? std::move(again) : nullptr;

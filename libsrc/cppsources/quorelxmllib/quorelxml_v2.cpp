@@ -12,6 +12,7 @@
 #include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_document.h"
 #include "quorelxmllib/header_session.h"
+#include "quorelxmllib/header_stream.h"
 #include "quorelxmllib/legacy_list.h"
 #include "quorelxmllib/xml_text.h"
 #include "sarutillib/bounded_text.h"
@@ -448,11 +449,38 @@ int quorelxml::readString(int channel, const char* field, char* const* values, i
     });
 }
 
+int quorelxml::readTexts(int channel, const char* field,
+                         const std::function<void(std::string_view)>& see) noexcept {
+    CallFrame frame{"quorelxml::readTexts", kSource};
+    if (!field) return frame.fail(QUO_REFUSED, "Null argument");
+    return guarded(frame, [&] {
+        if (document_)
+            document_->visit(channel, field, [&](const xmlNode* node) {
+                see(quo::NodeText{node});
+                return true;
+            });
+        return frame.success();
+    });
+}
+
+int quorelxml::readTexts(const char* file_name, int channel, const char* field,
+                         const std::function<void(std::string_view)>& see) noexcept {
+    CallFrame frame{"quorelxml::readTexts", kSource};
+    if (!file_name || !field) return frame.fail(QUO_REFUSED, "Null argument");
+    return guarded(frame, [&] {
+        const int status = quo::stream_texts(file_name, channel, field, see);
+        if (status == QUO_READ_FAILED || status == QUO_NO_MEMORY)
+            return quo::fail_unread(frame, status, file_name);
+        CallFrame::drop_errno();
+        return status ? frame.silent(status) : frame.success();
+    });
+}
+
 // --- writing ----------------------------------------------------------------------------------------------------
 
 int quorelxml::writeInt(int channel, const char* field, const std::int32_t* values, int count) noexcept {
     return Values::write_numbers(*this, "quorelxml::writeInt", channel, field, values, count,
-                                     [](std::int32_t value) { return quo::format_int(value); });
+                                 [](std::int32_t value) { return quo::format_int(value); });
 }
 int quorelxml::writeFloat(int channel, const char* field, const float* values, int count) noexcept {
     return Values::write_numbers(
@@ -461,7 +489,7 @@ int quorelxml::writeFloat(int channel, const char* field, const float* values, i
 }
 int quorelxml::writeDouble(int channel, const char* field, const double* values, int count) noexcept {
     return Values::write_numbers(*this, "quorelxml::writeDouble", channel, field, values, count,
-                                     [this](double value) { return Values::number_text(*this, value); });
+                                 [this](double value) { return Values::number_text(*this, value); });
 }
 
 int quorelxml::writeString(int channel, const char* field, const char* const* values, int count) noexcept {
@@ -475,6 +503,6 @@ int quorelxml::writeString(int channel, const char* field, const char* const* va
             texts.push_back(std::move(*text));
         }
         return Values::write(*this, frame, channel, field, count,
-                                 [&](std::size_t i) { return std::string_view{texts[i]}; });
+                             [&](std::size_t i) { return std::string_view{texts[i]}; });
     });
 }
