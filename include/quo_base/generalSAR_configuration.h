@@ -285,8 +285,7 @@ struct ConfigurationReview {
  * @param[in]  file     name of the configuration file
  * @param[in]  channel  number of the channel, usually 1
  * @param[out] review   replaced, also on failure
- * @return 0, with or without findings; 1 when the file is missing or no header document; 4 when it cannot be read;
- *         7 */
+ * @return 0, with or without findings; 1 when the file is missing, cannot be read or is no header document; 7. */
 QUO_BASE_API int reviewConfiguration(const char* file, int channel, ConfigurationReview& review);
 
 #endif
