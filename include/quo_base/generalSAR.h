@@ -61,10 +61,10 @@ public:
     int GSread(const char* file);
     /** Writes the present objects, the last of GSObject first, each into its own section, which it replaces; other
      * content of the file stays. An existing header is parsed once, and all sections are saved in one step, so
-     * that a failure leaves the file as it was; when memory runs out at any object nothing is saved, while an object
-     * that is refused (a text that XML cannot hold) keeps no other from the file. gsDataFile goes to the side file
-     * of the header's raster, which is the header itself where that ends in ".hdr", else saved after it. With
-     * nothing present no file is touched.
+     * that a failure leaves the file as it was; when memory runs out at any object nothing is saved, while an
+     * object that is refused (a text that XML cannot hold) keeps no other from the file. gsDataFile goes to the
+     * side file of the header's raster, which is the header itself where that ends in ".hdr", else saved after it.
+     * With nothing present no file is touched.
      * @return 0, also where something could not be written: callers rely on it, and the report tells. */
     int GSwrite(const char* file);
 

@@ -239,8 +239,8 @@ public:
     /** The record, enabled or not; null for a value that selects nothing. */
     [[nodiscard]] GeneralSAR_BaseConfiguration* GSget(GScObject object);
 
-    /** writepar() of each enabled record in the order of the selectors, all saved in one step: a failure leaves the
-     * file as it was. Returns 0; throws as writepar(). */
+    /** writepar() of each enabled record in the order of the selectors, all saved in one step: a failure leaves
+     * the file as it was. Returns 0; throws as writepar(). */
     int GSwrite(const char* file, int channel);
     /** Reads all six records in the order of the selectors and enables those that could be read.
      * @return 0; 1 with the ERROR entry "File : NAME DOES NOT EXIST!" when the file cannot be opened; 7. Throws as

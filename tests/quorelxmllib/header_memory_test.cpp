@@ -107,12 +107,9 @@ TEST_P(HeaderMemory, LeavesTheOldFileOrTheCompleteNewOne) {
     EXPECT_EQ(status, 0) << "never enough memory";
     EXPECT_LT(successes, 20) << "failures went unnoticed";
 }
-constexpr Job kJobs[] = {{"Object", write_object},
-                         {"Session", write_in_session},
-                         {"Document", write_document},
-                         {"Description", write_description},
-                         {"Fresh", write_object, true},
-                         {"FreshDescription", write_description, true},
+constexpr Job kJobs[] = {{"Object", write_object},         {"Session", write_in_session},
+                         {"Document", write_document},     {"Description", write_description},
+                         {"Fresh", write_object, true},    {"FreshDescription", write_description, true},
                          {"StyleSheet", write_instruction}};
 INSTANTIATE_TEST_SUITE_P(Jobs, HeaderMemory, testing::Combine(testing::ValuesIn(kJobs), testing::Bool()),
                          [](const auto& row) {

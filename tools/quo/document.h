@@ -9,8 +9,8 @@
 
 namespace tool {
 
-/** Throws Failure, with the cause, where a file is none that a header can be read from: missing, a folder or device,
- * not to be opened, or too large. */
+/** Throws Failure, with the cause, where a file is none that a header can be read from: missing, a folder or
+ * device, not to be opened, or too large. */
 void require_header_file(const std::string& file);
 
 /** A header document in memory: the fields of channel 1 as texts, by their path, such as

@@ -389,7 +389,8 @@ int polySAR::readhdr(const char* file) {
             DestroyPolys();
             return frame.fail(QUO_REFUSED, "More polynomials than the file can hold");
         }
-        if (const int status = CreatePolys(ndc, nfr, nsl2gr, ngr2sl, nsl2theta, nsl2phi)) return frame.callee(status);
+        if (const int status = CreatePolys(ndc, nfr, nsl2gr, ngr2sl, nsl2theta, nsl2phi))
+            return frame.callee(status);
         const int status = each_list(*this, [file](const Quantity& quantity, auto& list, std::int32_t count) {
             for (int i = 0; i < count; ++i) {
                 if (const int failed = list[i].readpar(file, polynomial_name(quantity, i).c_str())) return failed;
