@@ -57,13 +57,15 @@ public:
      * both are present, the orbit takes its wavelength from the sampling constants and, like the state vectors,
      * its look direction from the data set.
      * @return 0, whatever was found; 1 with the ERROR entry "File : %s DOES NOT EXIST!" where the file cannot be
-     *         opened, with nothing changed. */
+     *         opened, with nothing changed; 7. An object that memory is short for is not present. */
     int GSread(const char* file);
     /** Writes the present objects, the last of GSObject first, each into its own section, which it replaces; other
      * content of the file stays. An existing header is parsed once, and all sections are saved in one step, so
-     * that a failure leaves the file as it was. gsDataFile goes to the side file of the header's raster, which is
-     * the header itself where that ends in ".hdr". With nothing present no file is touched.
-     * @return 0. Deliberate: also where something could not be written; the report tells. */
+     * that a failure leaves the file as it was; when memory runs out at any object nothing is saved, while an
+     * object that is refused (a text that XML cannot hold) keeps no other from the file. gsDataFile goes to the
+     * side file of the header's raster, which is the header itself where that ends in ".hdr", else saved after it.
+     * With nothing present no file is touched.
+     * @return 0, also where something could not be written: callers rely on it, and the report tells. */
     int GSwrite(const char* file);
 
     /** The object, present or not; the caller casts it to the class that GSObject tells. Null for another number.

@@ -239,10 +239,11 @@ public:
     /** The record, enabled or not; null for a value that selects nothing. */
     [[nodiscard]] GeneralSAR_BaseConfiguration* GSget(GScObject object);
 
-    /** writepar() of each enabled record in the order of the selectors. Returns 0; throws as writepar(). */
+    /** writepar() of each enabled record in the order of the selectors, all saved in one step: a failure leaves
+     * the file as it was. Returns 0; throws as writepar(). */
     int GSwrite(const char* file, int channel);
     /** Reads all six records in the order of the selectors and enables those that could be read.
-     * @return 0; 1 with the ERROR entry "File : NAME DOES NOT EXIST!" when the file cannot be opened. Throws as
+     * @return 0; 1 with the ERROR entry "File : NAME DOES NOT EXIST!" when the file cannot be opened; 7. Throws as
      * readpar() at the first record that cannot be read, which stays enabled with those before it. */
     int GSread(const char* file, int channel);
     /** Clones each enabled record into the other container and enables it there. Returns 0. */
@@ -284,7 +285,7 @@ struct ConfigurationReview {
  * @param[in]  file     name of the configuration file
  * @param[in]  channel  number of the channel, usually 1
  * @param[out] review   replaced, also on failure
- * @return 0, with or without findings; 1 when the file is missing or no header document; 7. */
+ * @return 0, with or without findings; 1 when the file is missing, cannot be read or is no header document; 7. */
 QUO_BASE_API int reviewConfiguration(const char* file, int channel, ConfigurationReview& review);
 
 #endif

@@ -7,6 +7,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <string>
 #include <string_view>
@@ -29,9 +30,11 @@
  * refused.
  *
  * Headers are read without network access, without entity substitution and without loading of DTDs; a document
- * that declares anything in a DTD of its own or nests deeper than 256 elements counts as unreadable. A text above
- * ten million bytes, a file above 256 MiB and a real lack of memory give 7, and the file is never replaced by a
- * fresh document. File names hold at most 511 bytes; a longer one is refused, never cut.
+ * that declares anything in a DTD of its own or nests deeper than 256 elements counts as no header. A text above
+ * ten million bytes, names above ten million bytes in all, a file above 1 GiB and a real lack of memory give 7,
+ * and the file is never replaced by a fresh document. Nor is one that is there but cannot be opened or read (no
+ * rights, no free descriptor, a failing disk): a fresh document stands in for it in memory, and saving that
+ * gives 1. File names hold at most 511 bytes; a longer one is refused, never cut.
  *
  * Operations return 0, 1 (refused: missing field, bad argument, file that cannot be read or saved) or 7 (out of
  * memory) unless said otherwise. One object serves one thread at a time. */
@@ -44,10 +47,13 @@ struct RegistryAccess;
 /** One header document in memory. */
 class QUO_BASE_API quorelxml {
 public:
+    /** Largest header file that is read, bytes. */
+    static constexpr std::int64_t kMostFileBytes = 1LL << 30;
+
     /** An empty object: nothing loaded. */
     quorelxml() noexcept;
-    /** Loads the file; when it is missing, unreadable or no header document, a fresh document takes its place in
-     * memory. The disk is not touched before write(). */
+    /** Loads the file; when it is missing or no header document, a fresh document takes its place in memory, and
+     * stands in for one that cannot be read. The disk is not touched before write(). */
     explicit quorelxml(const char* file_name) noexcept;
     ~quorelxml();
     quorelxml(const quorelxml&) = delete;
@@ -64,7 +70,8 @@ public:
      * failure leaves the old file whole. */
     int setDescription(const char* file_name, const char* text) noexcept;
     /** Saves the document under its file name, freshly indented, UTF-8. The new file replaces the old one in one
-     * step: when saving fails (1) the old file is still whole. */
+     * step: when saving fails (1) the old file is still whole. A document that stands in for a file that could not
+     * be read is not saved (1). */
     int write() noexcept;
     /** Drops the document; safe to call repeatedly. Returns 0. */
     int clean() noexcept;
@@ -84,6 +91,17 @@ public:
     /** As above, every text cut to `room` - 1 bytes (never inside a UTF-8 character). */
     int readString(int channel, const char* field, char* const* values, int count, std::size_t room) noexcept;
 
+    /** Calls `see` with the whole text of every element that a field path leads to, in document order. 0, also
+     * where there is none; 7. */
+    int readTexts(int channel, const char* field, const std::function<void(std::string_view)>& see) noexcept;
+    /** Calls `see` with the text of every element that a field path leads to, in the order of the file, while the
+     * file is being read: no document is kept, so that arrays of any length take no memory. What was seen counts
+     * only when 0 comes back.
+     * @return 0, also where no element bears the path; 1 when the file is missing or no header document; 4 when it
+     * is there but cannot be read; 7 */
+    static int readTexts(const char* file_name, int channel, const char* field,
+                         const std::function<void(std::string_view)>& see) noexcept;
+
     /** Writes `count` values of a field into the document in memory, creating channel and elements as needed;
      * write() saves them. Of elements beyond `count` none is removed. A count below 1 writes nothing.
      * @return 0; 1 for a field path or a text that XML cannot hold, with the document unchanged; 7, where some of
@@ -100,7 +118,8 @@ public:
     void useExactNumbers(bool exact) noexcept;
 
 protected:
-    /** Loads the file under the stored name; 1 when there is no document. */
+    /** Loads the file under the stored name; 1 when there is no document, 4 when the file is there but cannot be
+     * read, 7 when it does not fit into memory. */
     int parse() noexcept;
     /** Whether the document is a header; mirrors the number of channels and the description. */
     bool isRecognized() noexcept;
@@ -149,7 +168,8 @@ private:
     friend struct quo::RegistryAccess;
     friend class GeneralSAR_BaseXML;
 
-    struct __attribute__((visibility("hidden"))) Operations;
+    struct __attribute__((visibility("hidden"))) Mirror;
+    struct __attribute__((visibility("hidden"))) Values;
     enum class Exactness : std::uint8_t { kDefault, kExact, kRounded };
 
     void mirrorDescription(std::string_view text);
@@ -160,6 +180,7 @@ private:
     std::int32_t number_of_channels_ = 0;
     bool debug_ = false;
     bool irreplaceable_ = false;  // the file does not fit into memory: no fresh document may replace it
+    bool unreadable_ = false;     // the file could not be read: a fresh document stands in but is never saved
     Exactness exactness_ = Exactness::kDefault;
 };
 

@@ -262,6 +262,28 @@ TEST_F(Configuration, ContainerWritesAndClonesWhatIsEnabled) {
     EXPECT_FALSE(written.GSexists(gscAzimuthConf));
 }
 
+// Every record was saved by itself: a disk that filled up on the way left a mixture of old and new ones.
+TEST_F(Configuration, ContainerIsSavedAsAWhole) {
+    const std::string other = report_.file("one_by_one.xml");
+    GeneralSAR_configuration all;
+    for (int i = 0; i < 6; ++i) all.GSenable(static_cast<GScObject>(i));
+    for (int i = 0; i < 6; ++i) ASSERT_EQ(all.GSget(static_cast<GScObject>(i))->writepar(other.c_str(), 1), 0);
+    const std::string complete = test::read_text(other);
+    const test::CapturedStderr silent;
+    for (const std::string old :
+         {"", "<QuorelXmlDoc><NumberOfChannels>0</NumberOfChannels><Description/></QuorelXmlDoc>"}) {
+        for (std::size_t room = 0; room < complete.size(); room += 97) {
+            test::write_text(file_, old);
+            const test::FullDisk full{room};
+            EXPECT_THROW(all.GSwrite(file_.c_str(), 1), quorelException);
+            EXPECT_EQ(test::read_text(file_), old) << room;
+        }
+    }
+    test::write_text(file_, "");
+    EXPECT_EQ(all.GSwrite(file_.c_str(), 1), 0);
+    EXPECT_EQ(test::read_text(file_), complete) << "the bytes of writing record by record";
+}
+
 TEST_F(Configuration, ContainerReadsAllOrThrowsAtTheFirst) {
     GeneralSAR_configuration all;
     for (int i = 0; i < 6; ++i) all.GSenable(static_cast<GScObject>(i));

@@ -27,7 +27,21 @@ using test::write_text;
 struct Job {
     const char* name;
     int (*run)(Shelf& object, const char* file);
+    bool from_nothing = false;
 };
+
+/** A header with more names than the first room of the parser's dictionary, a description that needs memory of its
+ * own, and a value in two pieces. */
+std::string old_header() {
+    std::string text = Shelf::text(), names;
+    for (int i = 0; i < 60; ++i) {
+        const std::string name = "AnElementWithALongNameOfItsOwn" + std::to_string(i);
+        names += "    <" + name + ">1</" + name + ">\n";
+    }
+    text.insert(text.find("  </Channel>"), names);
+    text.replace(text.find("A scene"), 7, std::string(100, 'd'));
+    return text.insert(text.find("2.25") + 1, "<!-- -->");
+}
 
 int write_object(Shelf& object, const char* file) { return object.writeAuxiliaryFile(file, 1, "New"); }
 int write_in_session(Shelf& object, const char* file) {
@@ -45,7 +59,10 @@ int write_document(Shelf&, const char* file) {
     if (const int status = document.writeString(1, "New/b", &text, 1)) return status;
     return document.write();
 }
-int write_description(Shelf&, const char* file) { return quorelxml{}.setDescription(file, "<New>"); }
+int write_description(Shelf&, const char* file) {
+    static const std::string text(9000, '<');  // more than fits into the serializer's first buffer
+    return quorelxml{}.setDescription(file, text.c_str());
+}
 int write_instruction(Shelf&, const char* file) {
     quorelxmlPi document;
     if (const int status = document.initXmlFile(file, "New.xsl")) return status;
@@ -59,7 +76,7 @@ class HeaderMemory : public testing::TestWithParam<std::tuple<Job, bool>> {};
 TEST_P(HeaderMemory, LeavesTheOldFileOrTheCompleteNewOne) {
     const auto& [job, once] = GetParam();
     const test::TemporaryFolder folder;
-    const std::string file = folder.file("header.xml"), old = Shelf::text();
+    const std::string file = folder.file("header.xml"), old = job.from_nothing ? "" : old_header();
     xmlMemSetup(std::free, xml_malloc, xml_realloc, xml_strdup);
     Shelf object;
     object.fill(3);
@@ -90,10 +107,9 @@ TEST_P(HeaderMemory, LeavesTheOldFileOrTheCompleteNewOne) {
     EXPECT_EQ(status, 0) << "never enough memory";
     EXPECT_LT(successes, 20) << "failures went unnoticed";
 }
-constexpr Job kJobs[] = {{"Object", write_object},
-                         {"Session", write_in_session},
-                         {"Document", write_document},
-                         {"Description", write_description},
+constexpr Job kJobs[] = {{"Object", write_object},         {"Session", write_in_session},
+                         {"Document", write_document},     {"Description", write_description},
+                         {"Fresh", write_object, true},    {"FreshDescription", write_description, true},
                          {"StyleSheet", write_instruction}};
 INSTANTIATE_TEST_SUITE_P(Jobs, HeaderMemory, testing::Combine(testing::ValuesIn(kJobs), testing::Bool()),
                          [](const auto& row) {
@@ -105,7 +121,7 @@ TEST(HeaderMemoryRead, GivesTheWholeObjectOrAFailure) {
     const test::TemporaryFolder folder;
     const std::string file = folder.file("header.xml");
     xmlMemSetup(std::free, xml_malloc, xml_realloc, xml_strdup);
-    write_text(file, Shelf::text());
+    write_text(file, old_header());
     Shelf whole;
     ASSERT_TRUE(whole.readAuxiliaryFile(file.c_str(), 1, "Shelf"));
     const test::CapturedStderr quiet;

@@ -49,6 +49,23 @@ std::string laughs() {
     return with_declarations(declarations, "&a39;");
 }
 
+/** The texts of a field as they pass while a file is read; none when that fails, with 1. */
+std::vector<std::string> passing_texts(const std::string& file, const char* field) {
+    std::vector<std::string> texts;
+    const int status =
+        quorelxml::readTexts(file.c_str(), 1, field, [&](std::string_view text) { texts.emplace_back(text); });
+    EXPECT_TRUE(status == 0 || status == 1) << status;
+    return status == 0 ? texts : std::vector<std::string>{};
+}
+/** The same from the document in memory. */
+std::vector<std::string> kept_texts(const std::string& file, const char* field) {
+    std::vector<std::string> texts;
+    EXPECT_EQ(
+        OpenDocument{file.c_str()}.readTexts(1, field, [&](std::string_view text) { texts.emplace_back(text); }),
+        0);
+    return texts;
+}
+
 std::vector<Hostile> hostile_files() {
     const std::string good = Shelf::text();
     const auto spliced = [&](const std::string& part) {
@@ -102,6 +119,7 @@ TEST(HostileHeaderFile, ReadsAsAFreshDocument) {
         double value = -17.3;
         EXPECT_EQ(document.readDouble(1, "Shelf/width", &value, 1), 1);
         EXPECT_EQ(value, -17.3);
+        EXPECT_EQ(quorelxml::readTexts(file.c_str(), 1, "Shelf/width", [](std::string_view) {}), 1);
 
         Shelf object, fresh;
         EXPECT_FALSE(object.readAuxiliaryFile(file.c_str(), 1, "Shelf"));
@@ -113,6 +131,20 @@ TEST(HostileHeaderFile, ReadsAsAFreshDocument) {
         EXPECT_TRUE(fresh.readAuxiliaryFile(file.c_str(), 1, "Shelf"));
         EXPECT_TRUE(object == fresh);
     }
+}
+
+TEST(HostileHeaderFile, PassesByWithTheTextsOfTheDocument) {
+    const test::TemporaryFolder folder;
+    const std::string file = folder.file("header.xml");
+    write_text(file, header_text("<a> </a><a>1<!-- -->2<b>3</b></a><a/><x:a xmlns:x='u'>4</x:a><c><a>5</a></c>"
+                                 "</Channel><Channel Number='2'><a>6</a></Channel><Channel Number='1'>"
+                                 "<a><![CDATA[<7>]]>&amp;</a><a><a>8</a></a>"));
+    for (const char* field : {"a", "a/a", "c/a", "a/b", "", "/", "a/", "none", "c//a"}) {
+        SCOPED_TRACE(field);
+        EXPECT_EQ(passing_texts(file, field), kept_texts(file, field));
+    }
+    EXPECT_THAT(passing_texts(file, "a"), testing::ElementsAre(" ", "123", "", "<7>&", "8"));
+    EXPECT_EQ(quorelxml::readTexts(folder.path().c_str(), 1, "a", [](std::string_view) {}), 4);
 }
 
 TEST(HostileHeaderFile, IsAcceptedWithADoctypeThatDeclaresNothing) {
@@ -150,6 +182,8 @@ TEST(HostileHeaderFile, SurvivesEveryChangedByte) {
         std::string changed = text;
         changed[place] = "<9\xFF"[place % 3];
         write_text(file, changed);
+        for (const char* field : {"Shelf", "Shelf/pages/val", "Shelf/label"})
+            EXPECT_EQ(passing_texts(file, field), kept_texts(file, field)) << place;
         Shelf object, again;
         if (!object.readAuxiliaryFile(file.c_str(), 1, "Shelf") || ++read % 16 != 0) continue;
         EXPECT_EQ(object.writeAuxiliaryFile(file.c_str(), 1, "Shelf"), 0);
@@ -238,24 +272,31 @@ TEST(HostileHeaderFile, NeverReplacesAFileThatDoesNotFitIntoMemory) {
     EXPECT_TRUE(quo::read_file(file.c_str(), 200'000'000) == text);
 }
 
-// A pipe has no length to look at beforehand.
+// A pipe has no length to look at beforehand; a file has, and is not read at all. What is too large stays.
 TEST(HostileHeaderFile, IsNotReadBeyondTheLimit) {
     const test::TemporaryFolder folder;
+    const test::Report report;
     const test::CapturedStderr quiet;
-    const std::string file = folder.file("pipe");
-    ASSERT_EQ(mkfifo(file.c_str(), 0600), 0);
+    const std::string pipe_name = folder.file("pipe"), file = folder.file("large.xml");
+    ASSERT_EQ(mkfifo(pipe_name.c_str(), 0600), 0);
     std::signal(SIGPIPE, SIG_IGN);
     std::int64_t taken = 0;
     std::thread writer{[&] {
         const std::string blanks(1 << 20, ' ');
-        const int pipe = open(file.c_str(), O_WRONLY);
-        for (ssize_t done = 0; done >= 0 && taken < 400 << 20; taken += done)
+        const int pipe = open(pipe_name.c_str(), O_WRONLY);
+        for (ssize_t done = 0; done >= 0 && taken < 2 * quorelxml::kMostFileBytes; taken += done)
             done = write(pipe, blanks.data(), blanks.size());
         close(pipe);
     }};
-    EXPECT_EQ(quorelxml{}.initXmlFile(file.c_str()), 7);
+    EXPECT_EQ(quorelxml{}.initXmlFile(pipe_name.c_str()), 7);
     writer.join();
-    EXPECT_LT(taken, 300 << 20);
+    EXPECT_LT(taken, quorelxml::kMostFileBytes + (16 << 20));
+
+    write_text(file, Shelf::text());
+    std::filesystem::resize_file(file, static_cast<std::uintmax_t>(quorelxml::kMostFileBytes) + 1);
+    EXPECT_EQ(quorelxml{}.setDescription(file.c_str(), "New"), 7);
+    EXPECT_THAT(report.messages("ERROR"), testing::Contains("Header file " + file + " is larger than 1 GiB"));
+    EXPECT_EQ(std::filesystem::file_size(file), static_cast<std::uintmax_t>(quorelxml::kMostFileBytes) + 1);
 }
 
 }  // namespace

@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "commands.h"
+#include "document.h"
 #include "failure.h"
 #include "number.h"
 #include "output.h"
@@ -193,6 +194,8 @@ public:
     [[nodiscard]] std::string name() const { return folder_ + "/configuration.xml"; }
     [[nodiscard]] std::string text() const {
         std::ifstream stream{name(), std::ios::binary};
+        // What cannot be opened would look empty, and take the place of the file that records are added to.
+        if (!stream) throw Failure(name() + ": " + system_cause());
         return {std::istreambuf_iterator<char>{stream}, {}};
     }
 
@@ -201,10 +204,7 @@ private:
 };
 
 ConfigurationReview review_of(const std::string& file) {
-    std::error_code error;
-    const auto kind = std::filesystem::status(file, error).type();
-    if (kind == std::filesystem::file_type::not_found) throw Failure(file + ": no such file");
-    if (kind != std::filesystem::file_type::regular) throw Failure(file + ": not a regular file");
+    require_header_file(file);
     ConfigurationReview review;
     const int status = reviewConfiguration(file.c_str(), kChannel, review);
     if (status == QUO_REFUSED) throw Failure(file + ": is no configuration file");

@@ -1,18 +1,33 @@
 #include "document.h"
 
+#include <cstdint>
 #include <filesystem>
+#include <fstream>
+#include <string_view>
 
 #include "failure.h"
 
 namespace tool {
 
-Document::Document(const std::string& file) : file_{file} {
+void require_header_file(const std::string& file) {
+    static_assert(quorelxml::kMostFileBytes == 1LL << 30);
     std::error_code error;
     const auto kind = std::filesystem::status(file, error).type();
     if (kind == std::filesystem::file_type::not_found) throw Failure(file + ": no such file");
+    if (kind == std::filesystem::file_type::none) throw Failure(file + ": " + error.message());
     if (kind != std::filesystem::file_type::regular) throw Failure(file + ": not a regular file");
+    if (!std::ifstream{file}) throw Failure(file + ": " + system_cause());
+    if (std::filesystem::file_size(file, error) > static_cast<std::uintmax_t>(quorelxml::kMostFileBytes))
+        throw Failure(file + ": is larger than 1 GiB, the limit of a header");
+}
+
+Document::Document(const std::string& file) : file_{file} {
+    require_header_file(file);
     storeFileName(file.c_str());
-    if (parse() != QUO_OK || !isRecognized()) throw Failure(file + ": is no header document");
+    const int status = parse();
+    if (status == QUO_READ_FAILED) throw Failure(file + ": cannot be read");
+    if (status == QUO_NO_MEMORY) throw Failure(file + ": does not fit into memory");
+    if (status != QUO_OK || !isRecognized()) throw Failure(file + ": is no header document");
 }
 
 bool Document::in(const std::string& file) {
@@ -23,16 +38,11 @@ bool Document::in(const std::string& file) {
 
 std::vector<std::string> Document::values(const std::string& field) {
     const std::string path = is_array(field) ? field + "/val" : field;
-    const int number = count(path);
-    if (number < 1) throw Failure(file_ + ": has no field " + field);
-    std::vector<std::vector<char>> rooms(static_cast<std::size_t>(number), std::vector<char>(kTextRoom));
-    std::vector<char*> texts;
-    texts.reserve(rooms.size());
-    for (auto& room : rooms) texts.push_back(room.data());
-    if (readString(kChannel, path.c_str(), texts.data(), number, kTextRoom) != QUO_OK) {
-        throw Failure(file_ + ": cannot read " + field);
-    }
-    return {texts.begin(), texts.end()};
+    std::vector<std::string> texts;
+    const int status = readTexts(kChannel, path.c_str(), [&](std::string_view text) { texts.emplace_back(text); });
+    if (status != QUO_OK) throw Failure(file_ + ": cannot read " + field);
+    if (texts.empty()) throw Failure(file_ + ": has no field " + field);
+    return texts;
 }
 
 void Document::replace(const std::string& field, const std::vector<std::string>& values) {

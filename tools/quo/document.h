@@ -9,6 +9,10 @@
 
 namespace tool {
 
+/** Throws Failure, with the cause, where a file is none that a header can be read from: missing, a folder or
+ * device, not to be opened, or too large. */
+void require_header_file(const std::string& file);
+
 /** A header document in memory: the fields of channel 1 as texts, by their path, such as
  * "SamplingConstants/prf_hz". A path that is no chain of names is found nowhere. */
 class Document : private quorelxml {

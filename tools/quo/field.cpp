@@ -4,6 +4,8 @@
 #include <nlohmann/json.hpp>
 #include <optional>
 #include <string>
+#include <string_view>
+#include <utility>
 #include <vector>
 
 #include "commands.h"
@@ -39,20 +41,54 @@ nlohmann::json as_json(const std::string& text, bool numeric) {
     return whole ? nlohmann::json(static_cast<std::int64_t>(*number)) : nlohmann::json(*number);
 }
 
+/** The values of a field, read without the document: headers can be far larger than one field of them. */
+class FieldReader {
+public:
+    explicit FieldReader(const FieldOptions& options)
+        : file_{options.header}, json_{options.json}, numeric_{options.json && is_number(options.field)} {
+        require_header_file(file_);
+        is_array_ = read(options.field + "/val");
+        if (!is_array_ && !read(options.field)) throw Failure(file_ + ": has no field " + options.field);
+    }
+
+    [[nodiscard]] const std::string& lines() const { return lines_; }
+    /** One value, or the list of an array. */
+    [[nodiscard]] nlohmann::json value() && {
+        return count_ == 1 && !is_array_ ? std::move(list_[0]) : std::move(list_);
+    }
+
+private:
+    /** Whether any element has the path. */
+    bool read(const std::string& path) {
+        constexpr int kChannel = 1;
+        const int status = quorelxml::readTexts(file_.c_str(), kChannel, path.c_str(), [&](std::string_view text) {
+            ++count_;
+            if (json_)
+                list_.push_back(as_json(std::string{text}, numeric_));
+            else
+                (lines_ += text) += '\n';
+        });
+        if (status == QUO_READ_FAILED) throw Failure(file_ + ": cannot be read");
+        if (status == QUO_NO_MEMORY) throw Failure(file_ + ": does not fit into memory");
+        if (status != QUO_OK) throw Failure(file_ + ": is no header document");
+        return count_ > 0;
+    }
+
+    std::string file_, lines_;
+    nlohmann::json list_ = nlohmann::json::array();
+    bool json_, numeric_, is_array_ = false;
+    std::int64_t count_ = 0;
+};
+
 int get_field(const FieldOptions& options) {
     require_field(options.field);
-    Document document{options.header};
-    const std::vector<std::string> values = document.values(options.field);
+    FieldReader reader{options};
     Output output{"-"};
     if (options.json) {
-        const bool numeric = is_number(options.field);
-        nlohmann::json list = nlohmann::json::array();
-        for (const std::string& value : values) list.push_back(as_json(value, numeric));
-        const bool single = values.size() == 1 && !document.is_array(options.field);
-        const nlohmann::json about{{"field", options.field}, {"value", single ? list[0] : list}};
+        const nlohmann::json about{{"field", options.field}, {"value", std::move(reader).value()}};
         output.write(about.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n");
     } else {
-        for (const std::string& value : values) output.write(value + "\n");
+        output.write(reader.lines());
     }
     output.commit();
     return kFine;

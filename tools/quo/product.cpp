@@ -2,8 +2,8 @@
 
 #include <array>
 #include <cmath>
-#include <filesystem>
 
+#include "document.h"
 #include "failure.h"
 
 namespace tool {
@@ -31,10 +31,7 @@ bool is_known(const geopoint& point) {
 }  // namespace
 
 void read_product(const std::string& header, GeneralSAR& product) {
-    std::error_code error;
-    const auto kind = std::filesystem::status(header, error).type();
-    if (kind == std::filesystem::file_type::not_found) throw Failure(header + ": no such file");
-    if (kind != std::filesystem::file_type::regular) throw Failure(header + ": not a regular file");
+    require_header_file(header);
     if (product.GSread(header.c_str()) != QUO_OK) throw Failure(header + ": cannot be read");
     for (int object = gsRoi; object < GeneralSAR::kObjects; ++object) {
         if (product.GSexists(static_cast<GSObject>(object))) return;

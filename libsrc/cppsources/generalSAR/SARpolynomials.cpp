@@ -10,6 +10,7 @@
 #include "profilelib/profile_look.h"
 #include "quo_base/profile.h"
 #include "quorelxmllib/field_table.h"
+#include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_session.h"
 #include "sarutillib/bounded_text.h"
 #include "sarutillib/checked_size.h"
@@ -365,41 +366,46 @@ QUO_POLY_OPERATIONS(SL2PHI, 5, nsl2phi)
 
 int polySAR::writehdr(const char* file) {
     quo::CallFrame frame{"polySAR::writehdr", kSource};
-    quo::JoinedSession session{file};
-    if (const int status = writeAuxiliaryFile(file, 1, kSetSection)) return frame.callee(status);
-    const int status = each_list(*this, [file](const Quantity& quantity, auto& list, std::int32_t count) {
-        for (int i = 0; i < count; ++i) {
-            if (const int failed = list[i].writepar(file, polynomial_name(quantity, i).c_str())) return failed;
-        }
-        return 0;
+    return quo::guarded(frame, [&] {
+        quo::JoinedSession session{file};
+        if (const int status = writeAuxiliaryFile(file, 1, kSetSection)) return frame.callee(status);
+        const int status = each_list(*this, [file](const Quantity& quantity, auto& list, std::int32_t count) {
+            for (int i = 0; i < count; ++i) {
+                if (const int failed = list[i].writepar(file, polynomial_name(quantity, i).c_str())) return failed;
+            }
+            return 0;
+        });
+        if (status != QUO_OK) return frame.callee(status);
+        if (const int saved = session.commit()) return frame.callee(saved);
+        return frame.success();
     });
-    if (status != QUO_OK) return frame.callee(status);
-    if (const int saved = session.commit()) return frame.callee(saved);
-    return frame.success();
 }
 
 int polySAR::readhdr(const char* file) {
     quo::CallFrame frame{"polySAR::readhdr", kSource};
-    const quo::JoinedSession session{file};
-    const quo::ProfileLook look{file};
-    DestroyPolys();
-    if (!readAuxiliaryFile(file, 1, kSetSection) && counts::kTable.read_profile(*this, file) != QUO_OK) {
+    return quo::guarded(frame, [&] {
+        const quo::JoinedSession session{file};
+        const quo::ProfileLook look{file};
         DestroyPolys();
-        return frame.silent(QUO_REFUSED);
-    }
-    if (!file_can_hold(*this, file)) {
-        DestroyPolys();
-        return frame.fail(QUO_REFUSED, "More polynomials than the file can hold");
-    }
-    if (const int status = CreatePolys(ndc, nfr, nsl2gr, ngr2sl, nsl2theta, nsl2phi)) return frame.callee(status);
-    const int status = each_list(*this, [file](const Quantity& quantity, auto& list, std::int32_t count) {
-        for (int i = 0; i < count; ++i) {
-            if (const int failed = list[i].readpar(file, polynomial_name(quantity, i).c_str())) return failed;
+        if (!readAuxiliaryFile(file, 1, kSetSection) && counts::kTable.read_profile(*this, file) != QUO_OK) {
+            DestroyPolys();
+            return frame.silent(QUO_REFUSED);
         }
-        return 0;
+        if (!file_can_hold(*this, file)) {
+            DestroyPolys();
+            return frame.fail(QUO_REFUSED, "More polynomials than the file can hold");
+        }
+        if (const int status = CreatePolys(ndc, nfr, nsl2gr, ngr2sl, nsl2theta, nsl2phi))
+            return frame.callee(status);
+        const int status = each_list(*this, [file](const Quantity& quantity, auto& list, std::int32_t count) {
+            for (int i = 0; i < count; ++i) {
+                if (const int failed = list[i].readpar(file, polynomial_name(quantity, i).c_str())) return failed;
+            }
+            return 0;
+        });
+        if (status != QUO_OK) return frame.callee(status);
+        return frame.success();
     });
-    if (status != QUO_OK) return frame.callee(status);
-    return frame.success();
 }
 
 int polySAR::clone(polySAR* to) const {

@@ -1,15 +1,26 @@
 #include "quo_base/generalSAR.h"
 
+#include <string>
+
 #include "diagnosticslib/call_frame.h"
+#include "generalSAR/raster_name.h"
 #include "generalSAR/readable_file.h"
 #include "profilelib/profile_look.h"
+#include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_session.h"
+#include "sarutillib/bounded_text.h"
 
 namespace {
 
 constexpr const char* kSource = "generalSAR";
 
 bool is_object(int object) { return object >= 0 && object < GeneralSAR::kObjects; }
+
+/** The side file that the data file is written to: the header itself, or another. "" where there is no raster. */
+std::string side_file_of(const char* header) {
+    const auto raster = quo::raster_of_header(quo::text_or_empty(header));
+    return raster ? *raster + ".hdr" : "";
+}
 
 }  // namespace
 
@@ -21,12 +32,15 @@ GeneralSAR::GeneralSAR()
 int GeneralSAR::GSread(const char* file) {
     quo::CallFrame frame{"GeneralSAR::GSread", kSource};
     if (const int status = quo::refuse_missing_file(frame, file)) return status;
-    GSdestroy();
-    const quo::JoinedSession session{file};
-    const quo::ProfileLook look{file};
-    for (int i = 0; i < kObjects; ++i) present_[i] = objects_[i]->readhdr(file) == QUO_OK;
-    linkObjects();
-    return frame.success();
+    return quo::guarded(frame, [&] {
+        const quo::JoinedSession session{file};
+        const quo::ProfileLook look{file};
+        GSdestroy();
+        for (int i = 0; i < kObjects; ++i)
+            present_[i] = quo::guarded(frame, [&] { return objects_[i]->readhdr(file); }) == QUO_OK;
+        linkObjects();
+        return frame.success();
+    });
 }
 
 void GeneralSAR::linkObjects() {
@@ -38,11 +52,15 @@ void GeneralSAR::linkObjects() {
 
 int GeneralSAR::GSwrite(const char* file) {
     quo::CallFrame frame{"GeneralSAR::GSwrite", kSource};
-    quo::JoinedSession session{file};
-    for (int i = kObjects; i-- > 0;)
-        if (present_[i]) objects_[i]->writehdr(file);
-    static_cast<void>(session.commit());  // deliberate: the outcome stands in the report alone
-    return frame.success();
+    const int status = quo::guarded(frame, [&] {
+        quo::JoinedSession header{file}, side_file{side_file_of(file).c_str()};
+        for (int i = kObjects; i-- > 0;)
+            if (present_[i] && objects_[i]->writehdr(file) == QUO_NO_MEMORY)
+                quo::HeaderSession::fail_all(QUO_NO_MEMORY);
+        const int saved = header.commit();
+        return saved ? saved : side_file.commit();
+    });
+    return status ? QUO_OK : frame.success();  // callers rely on 0: the outcome stands in the report alone
 }
 
 GeneralSAR_Base* GeneralSAR::GSget(GSObject object) noexcept {

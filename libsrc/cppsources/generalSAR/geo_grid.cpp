@@ -5,6 +5,7 @@
 #include "diagnosticslib/call_frame.h"
 #include "generalSAR/raster_name.h"
 #include "quorelxmllib/field_table.h"
+#include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_session.h"
 #include "sarutillib/bounded_text.h"
 
@@ -39,22 +40,26 @@ int Obj::clone(geoCoords_Obj* to) const {
 
 int Obj::writehdr(const char* file) {
     quo::CallFrame frame{"geoCoords_Obj::writehdr", kSource};
-    quo::JoinedSession session{file};
-    if (const int status = writeAuxiliaryFile(file, 1, kTable.section())) return frame.callee(status);
-    for (const auto& [name, point] : kPoints)
-        if (const int status = (this->*point).writehdr(file, name)) return frame.callee(status);
-    if (const int status = session.commit()) return frame.callee(status);
-    return frame.success();
+    return quo::guarded(frame, [&] {
+        quo::JoinedSession session{file};
+        if (const int status = writeAuxiliaryFile(file, 1, kTable.section())) return frame.callee(status);
+        for (const auto& [name, point] : kPoints)
+            if (const int status = (this->*point).writehdr(file, name)) return frame.callee(status);
+        if (const int status = session.commit()) return frame.callee(status);
+        return frame.success();
+    });
 }
 
 int Obj::readhdr(const char* file) {
     quo::CallFrame frame{"geoCoords_Obj::readhdr", kSource};
-    const quo::JoinedSession session{file};
-    if (!readAuxiliaryFile(file, 1, kTable.section()))
-        if (const int status = kTable.read_profile(*this, file, kProfileSection)) return frame.silent(status);
-    for (const auto& [name, point] : kPoints)
-        if (const int status = (this->*point).readhdr(file, name)) return frame.callee(status);
-    return frame.success();
+    return quo::guarded(frame, [&] {
+        const quo::JoinedSession session{file};
+        if (!readAuxiliaryFile(file, 1, kTable.section()))
+            if (const int status = kTable.read_profile(*this, file, kProfileSection)) return frame.silent(status);
+        for (const auto& [name, point] : kPoints)
+            if (const int status = (this->*point).readhdr(file, name)) return frame.callee(status);
+        return frame.success();
+    });
 }
 
 int GSRoi_Obj::readhdr(const char* file) { return Roi.read_roi(file, kRoiSection); }

@@ -10,6 +10,7 @@
 #include "diagnosticslib/call_frame.h"
 #include "quo_base/generalSAR_configuration.h"
 #include "quorelxmllib/header_document.h"
+#include "quorelxmllib/header_session.h"
 #include "sarutillib/number_text.h"
 
 namespace {
@@ -179,6 +180,11 @@ int reviewConfiguration(const char* file, int channel, ConfigurationReview& revi
     review = {};
     try {
         const int status = file ? review_file(file, channel, review) : QUO_REFUSED;
+        if (status == QUO_NO_MEMORY) return quo::fail_unread(frame, status, file);
+        if (status == QUO_READ_FAILED) {
+            static_cast<void>(quo::fail_unread(frame, status, file));
+            return QUO_REFUSED;
+        }
         quo::CallFrame::drop_errno();
         if (status == QUO_REFUSED) return frame.fail(status, "The file is missing or no configuration file");
         if (status == QUO_OK) return frame.success();

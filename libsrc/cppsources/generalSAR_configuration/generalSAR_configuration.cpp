@@ -2,11 +2,13 @@
 
 #include <array>
 #include <limits>
+#include <new>
 #include <typeinfo>
 
 #include "diagnosticslib/call_frame.h"
 #include "generalSAR/readable_file.h"
 #include "quorelxmllib/field_table.h"
+#include "quorelxmllib/header_session.h"
 #include "sarutillib/bounded_text.h"
 
 namespace {
@@ -416,8 +418,14 @@ bool GeneralSAR_configuration::GSexists(GScObject object) const {
 }
 
 int GeneralSAR_configuration::GSwrite(const char* file, int channel) {
-    for (int i = 0; i < kSelectors; ++i) {
-        if (enabled_[i]) table_[i]->writepar(file, channel);
+    try {
+        quo::JoinedSession session{file};
+        for (int i = 0; i < kSelectors; ++i) {
+            if (enabled_[i]) table_[i]->writepar(file, channel);
+        }
+        if (session.commit() != QUO_OK) fail("GSwrite", "Cannot write specific configuration file");
+    } catch (const std::bad_alloc&) {
+        fail("GSwrite", "Cannot write specific configuration file");
     }
     return QUO_OK;
 }
@@ -425,9 +433,14 @@ int GeneralSAR_configuration::GSwrite(const char* file, int channel) {
 int GeneralSAR_configuration::GSread(const char* file, int channel) {
     quo::CallFrame frame{"GeneralSAR_configuration::GSread", kSource};
     if (const int status = quo::refuse_missing_file(frame, file)) return status;
-    for (int i = 0; i < kSelectors; ++i) {
-        enabled_[i] = true;
-        enabled_[i] = table_[i]->readpar(file, channel) == QUO_OK;
+    try {
+        const quo::JoinedSession session{file};
+        for (int i = 0; i < kSelectors; ++i) {
+            enabled_[i] = true;
+            enabled_[i] = table_[i]->readpar(file, channel) == QUO_OK;
+        }
+    } catch (const std::bad_alloc&) {
+        return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
     }
     return frame.success();
 }

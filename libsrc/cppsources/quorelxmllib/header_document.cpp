@@ -1,11 +1,8 @@
 #include "quorelxmllib/header_document.h"
 
-#include <fcntl.h>
 #include <libxml/parser.h>
-#include <libxml/xmlerror.h>
+#include <libxml/parserInternals.h>
 #include <libxml/xmlsave.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
@@ -14,6 +11,7 @@
 #include <utility>
 
 #include "quo_base/api.h"
+#include "quorelxmllib/header_source.h"
 #include "sarutillib/file_io.h"
 #include "sarutillib/number_text.h"
 
@@ -24,49 +22,18 @@ constexpr const char* kRoot = "QuorelXmlDoc";
 constexpr const char* kChannel = "Channel";
 constexpr const char* kNumber = "Number";
 
-// A tree takes up to thirty times the memory of its text; the largest headers have a few megabytes.
-constexpr std::int64_t kMostBytes = 256LL << 20;
-
 const xmlChar* xml(const char* text) { return reinterpret_cast<const xmlChar*>(text); }
 
-/** While it lives, libxml2 prints nothing on this thread, and a lack of memory is noted, which later errors hide.
- */
-class XmlErrors {
-public:
-    XmlErrors() noexcept : handler_{xmlStructuredError}, context_{xmlStructuredErrorContext} {
-        xmlSetStructuredErrorFunc(this, [](void* self, xmlError* error) {
-            if (error->code == XML_ERR_NO_MEMORY) static_cast<XmlErrors*>(self)->out_of_memory_ = true;
-        });
-    }
-    ~XmlErrors() { xmlSetStructuredErrorFunc(context_, handler_); }
-    XmlErrors(const XmlErrors&) = delete;
-    XmlErrors& operator=(const XmlErrors&) = delete;
-
-    [[nodiscard]] bool out_of_memory() const noexcept { return out_of_memory_; }
-
-private:
-    xmlStructuredErrorFunc handler_;
-    void* context_;
-    bool out_of_memory_ = false;
-};
+/** An element without content, rather than with an empty one: an empty text node would be written as <a></a> and
+ * stop the indentation. Null when memory is short, also for the name alone. */
+xmlNode* new_element(xmlDoc* tree, const char* name) {
+    xmlNode* node = xmlNewDocNode(tree, nullptr, xml(name), nullptr);
+    if (node && node->name) return node;
+    xmlFreeNode(node);
+    return nullptr;
+}
 
 // --- reading ----------------------------------------------------------------------------------------------------
-
-struct Source {
-    Descriptor file;
-    std::int64_t bytes = 0;
-    bool too_long = false;
-};
-
-int read_source(void* context, char* buffer, int length) {
-    auto& source = *static_cast<Source*>(context);
-    ssize_t got = 0;
-    do got = ::read(source.file.get(), buffer, static_cast<std::size_t>(length));
-    while (got < 0 && errno == EINTR);
-    if (got > 0) source.bytes += got;
-    source.too_long = source.bytes > kMostBytes;
-    return source.too_long ? -1 : static_cast<int>(got);
-}
 
 void stop(void* parser) { xmlStopParser(static_cast<xmlParserCtxt*>(parser)); }
 
@@ -88,56 +55,63 @@ std::unique_ptr<xmlParserCtxt, decltype(&xmlFreeParserCtxt)> make_parser() {
     return {parser, &xmlFreeParserCtxt};
 }
 
-constexpr int kOptions = XML_PARSE_NOBLANKS | XML_PARSE_COMPACT | XML_PARSE_NONET;
-
 /** Parses with `read(parser)`. 0, 1 for what is no XML that we accept, or 7. */
 template <typename Read>
 int parse(XmlTree& tree, Read read) {
     const XmlErrors errors;
     const auto parser = make_parser();
     if (!parser) return QUO_NO_MEMORY;
+    errno = 0;
     tree.reset(read(parser.get()));
     // A text that is too long counts as a lack of memory too; what fails without an error never got to parse.
     const bool unexplained = !tree && parser->errNo == XML_ERR_OK;
     if (errors.out_of_memory() || unexplained) return QUO_NO_MEMORY;
     // A parser that was stopped hands over the part that it has and calls it well-formed.
-    return tree && !parser->disableSAX ? QUO_OK : QUO_REFUSED;
-}
-
-int open_source(const char* file, Source& source) {
-    source.file = Descriptor{::open(file, O_RDONLY | O_CLOEXEC)};
-    if (!source.file) return errno == ENOMEM ? QUO_NO_MEMORY : QUO_REFUSED;
-    struct stat found {};
-    const bool usable = ::fstat(source.file.get(), &found) == 0 && !S_ISDIR(found.st_mode);
-    return usable ? QUO_OK : QUO_REFUSED;
+    if (tree && !parser->disableSAX) return QUO_OK;
+    // The dictionary of names says nothing when it cannot grow: the parser takes the name for a missing one.
+    const bool names_do_not_fit = xmlDictGetUsage(parser->dict) > XML_MAX_DICTIONARY_LIMIT;
+    return errno == ENOMEM || names_do_not_fit ? QUO_NO_MEMORY : QUO_REFUSED;
 }
 
 }  // namespace
 
 int HeaderDocument::load(const char* file, std::shared_ptr<HeaderDocument>& document) {
-    Source source;
-    if (const int status = open_source(file, source)) return status;
+    HeaderSource source;
+    if (const int status = source.open(file)) return status;
     XmlTree tree;
     const int status = parse(tree, [&](xmlParserCtxt* parser) {
-        return xmlCtxtReadIO(parser, read_source, nullptr, &source, nullptr, nullptr, kOptions);
+        return xmlCtxtReadIO(parser, HeaderSource::read, nullptr, &source, nullptr, nullptr, kHeaderOptions);
     });
-    if (source.too_long) return QUO_NO_MEMORY;
+    if (const int failed = source.status()) return failed;
     if (status != QUO_OK) return status;
-    document = std::make_shared<HeaderDocument>(tree.get(), source.bytes);
+    document = std::make_shared<HeaderDocument>(tree.get(), source.bytes());
     (void)tree.release();
     return QUO_OK;
 }
 
-std::shared_ptr<HeaderDocument> HeaderDocument::create() {
+int HeaderDocument::load_or_create(const char* file, std::shared_ptr<HeaderDocument>& document) {
+    const int status = load(file, document);
+    if (status == QUO_NO_MEMORY || (document && document->is_header())) return status;
+    const int error = errno;
+    const bool unreadable = status == QUO_READ_FAILED;
+    document = create(unreadable);
+    errno = error;
+    if (!document) return QUO_NO_MEMORY;
+    return unreadable ? status : QUO_OK;
+}
+
+std::shared_ptr<HeaderDocument> HeaderDocument::create(bool stands_in) {
     XmlTree tree{xmlNewDoc(xml("1.0"))};
-    xmlNode* root = tree ? xmlNewDocNode(tree.get(), nullptr, xml(kRoot), nullptr) : nullptr;
+    xmlNode* root = tree ? new_element(tree.get(), kRoot) : nullptr;
     if (!root) return nullptr;
     xmlDocSetRootElement(tree.get(), root);
-    if (!xmlNewTextChild(root, nullptr, xml("NumberOfChannels"), xml("0")) ||
-        !xmlNewTextChild(root, nullptr, xml("Description"), xml("My description")))
-        return nullptr;
     auto document = std::make_shared<HeaderDocument>(tree.get(), -1);
     (void)tree.release();
+    document->stands_in_ = stands_in;
+    for (const auto& [name, text] : {std::pair{"NumberOfChannels", "0"}, {"Description", "My description"}}) {
+        xmlNode* element = document->append(root, name);
+        if (!element || !document->set_text(element, text)) return nullptr;
+    }
     return document;
 }
 
@@ -198,7 +172,7 @@ XmlTree reloaded(xmlDoc* tree) {
     XmlTree again;
     const int status = parse(again, [&](xmlParserCtxt* parser) -> xmlDoc* {
         return text ? xmlCtxtReadMemory(parser, reinterpret_cast<const char*>(text), size, nullptr, nullptr,
-                                        kOptions)
+                                        kHeaderOptions)
                     : nullptr;
     });
     return status == QUO_OK ? std::move(again) : nullptr;
@@ -207,6 +181,7 @@ XmlTree reloaded(xmlDoc* tree) {
 }  // namespace
 
 bool HeaderDocument::save(const char* file) {
+    if (stands_in_) return false;
     const XmlErrors errors;
     Sink sink{file};
     if (!sink.good()) return false;
@@ -223,21 +198,32 @@ bool HeaderDocument::save(const char* file) {
     // xmlSaveFormatFileEnc.
     xmlOutputBuffer* output = xmlOutputBufferCreateIO(write_sink, nullptr, &sink, nullptr);
     if (!output) return false;
-    return xmlSaveFormatFileTo(output, tree_.get(), "UTF-8", 1) >= 0 && sink.commit();
+    // The serializer goes on, without the bytes that did not fit into its buffer, when memory runs out.
+    const bool written = xmlSaveFormatFileTo(output, tree_.get(), "UTF-8", 1) >= 0 && !errors.out_of_memory();
+    return written && sink.commit();
 }
 
 // --- looking up -------------------------------------------------------------------------------------------------
 
-NodeText::NodeText(xmlNode* node) noexcept {
-    const xmlNode* child = node->children;
-    if (!child) return;
-    const bool is_text = child->type == XML_TEXT_NODE || child->type == XML_CDATA_SECTION_NODE;
-    const xmlChar* text = is_text && !child->next ? child->content : nullptr;
-    if (!text) {
-        copy_.reset(xmlNodeGetContent(node));
-        text = copy_.get();
+namespace {
+
+bool is_text(const xmlNode* node) { return node->type == XML_TEXT_NODE || node->type == XML_CDATA_SECTION_NODE; }
+
+void append_texts(const xmlNode* parent, std::string& text) {
+    for (const xmlNode* node = parent->children; node; node = node->next) {
+        if (is_text(node) && node->content) text += reinterpret_cast<const char*>(node->content);
+        if (node->type == XML_ELEMENT_NODE) append_texts(node, text);
     }
-    if (text) text_ = reinterpret_cast<const char*>(text);
+}
+
+}  // namespace
+
+NodeText::NodeText(const xmlNode* node) {
+    const xmlNode* child = node->children;
+    if (child && is_text(child) && !child->next)
+        in_place_ = reinterpret_cast<const char*>(child->content);
+    else
+        append_texts(node, copy_);
 }
 
 bool is_named(const xmlNode* node, std::string_view name) noexcept {
@@ -374,14 +360,10 @@ xmlNode* HeaderDocument::append(xmlNode* parent, std::string_view name) {
     // Blanks that were the whole text of an element would keep its new children from being indented.
     if (parent->children && parent->children == parent->last && xmlIsBlankNode(parent->children))
         unlink(parent->children);
-    // No content, rather than an empty one: an empty text node would be written as <a></a> and stop the
-    // indentation.
-    xmlNode* node = xmlNewChild(parent, nullptr, xml(std::string{name}.c_str()), nullptr);
-    if (node && !node->name) {  // made while memory ran out
-        unlink(node);
-        return nullptr;
-    }
-    if (node) note_appended(parent, node);
+    xmlNode* node = new_element(tree_.get(), std::string{name}.c_str());
+    if (!node) return nullptr;
+    xmlAddChild(parent, node);
+    note_appended(parent, node);
     return node;
 }
 

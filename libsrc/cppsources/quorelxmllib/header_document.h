@@ -20,17 +20,18 @@ struct FreeXml {
 
 using XmlTree = std::unique_ptr<xmlDoc, FreeXml>;
 
-/** Text of an element: in place where it is one piece, else a copy. */
+/** Text of an element and of all below it: in place where it is one piece, else a copy, for which memory may be
+ * short (std::bad_alloc). */
 class NodeText {
 public:
-    explicit NodeText(xmlNode* node) noexcept;
+    explicit NodeText(const xmlNode* node);
     /** NUL-terminated; never null. */
-    [[nodiscard]] const char* c_str() const noexcept { return text_; }
-    operator std::string_view() const noexcept { return text_; }
+    [[nodiscard]] const char* c_str() const noexcept { return in_place_ ? in_place_ : copy_.c_str(); }
+    operator std::string_view() const noexcept { return c_str(); }
 
 private:
-    std::unique_ptr<xmlChar, FreeXml> copy_;
-    const char* text_ = "";
+    std::string copy_;
+    const char* in_place_ = nullptr;
 };
 
 /** Whether a node is an element with this name, in no namespace. */
@@ -53,11 +54,16 @@ private:
  * by name and compared as data: nothing in them is an expression. */
 class HeaderDocument {
 public:
-    /** Parses a header file. 0; 1 when there is none or it is no XML that we accept (see quorelxml_v2.h); 7 when
-     * it does not fit into memory: then nothing may take its place. */
+    /** Parses a header file. 0; 1 when there is none or it is no XML that we accept (see quorelxml_v2.h); 4 when
+     * it is there but cannot be read, 7 when it does not fit into memory: then nothing may take its place, and
+     * errno may tell why. */
     static int load(const char* file, std::shared_ptr<HeaderDocument>& document);
-    /** A fresh document, or null when memory is short. */
-    static std::shared_ptr<HeaderDocument> create();
+    /** As load(), but a fresh document takes the place of what is no header: 0. With 4 the fresh document only
+     * stands in for one that cannot be read. Null with 7. */
+    static int load_or_create(const char* file, std::shared_ptr<HeaderDocument>& document);
+    /** A fresh document, or null when memory is short. One that stands in for a file that cannot be read answers
+     * as any other, but is never saved: the file may be whole. */
+    static std::shared_ptr<HeaderDocument> create(bool stands_in = false);
 
     HeaderDocument(xmlDoc* tree, std::int64_t source_bytes) noexcept : tree_{tree}, source_bytes_{source_bytes} {}
 
@@ -135,6 +141,7 @@ private:
     XmlTree tree_;
     std::int64_t source_bytes_;  // -1: made in memory
     std::int64_t written_values_ = 0;
+    bool stands_in_ = false;
     // Look-ups walk the children of each parent, until so many have been passed in vain that an index of a parent
     // with many children pays: without one, n polynomials would take n * n steps.
     mutable std::unordered_map<const xmlNode*, NameIndex> indices_;

@@ -1,12 +1,13 @@
 #include "quorelxmllib/header_session.h"
 
 #include <cerrno>
-#include <exception>
 #include <filesystem>
 #include <system_error>
 #include <utility>
 
 #include "diagnosticslib/call_frame.h"
+#include "quo_base/quorelxml_v2.h"
+#include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_document.h"
 #include "sarutillib/bounded_text.h"
 
@@ -30,22 +31,34 @@ bool same_file(const std::string& a, const char* b) {
 
 }  // namespace
 
-HeaderSession::HeaderSession(const char* file)
-    : outer_{std::exchange(innermost, this)}, file_{text_or_empty(file)} {}
+HeaderSession::HeaderSession(const char* file) : file_{text_or_empty(file)}, outer_{innermost} {
+    innermost = this;  // not before the name is stored, which may throw
+}
 
 HeaderSession::~HeaderSession() { innermost = outer_; }
 
-HeaderSession* HeaderSession::find(const char* file) noexcept {
+int fail_unread(CallFrame& frame, int status, const char* file) noexcept {
+    static_assert(quorelxml::kMostFileBytes == 1LL << 30);
+    const char* reason = status == QUO_READ_FAILED ? "cannot be read"
+                         : errno == EFBIG          ? "is larger than 1 GiB"
+                                                   : "does not fit into memory";
+    frame.check_errno();
+    char message[1024];
+    format_bounded(message, sizeof message, "Header file %s %s", file, reason);
+    return frame.fail(status, message);
+}
+
+HeaderSession* HeaderSession::find(const char* file) {
     if (!file) return nullptr;
     const int error_before = errno;
     HeaderSession* session = innermost;
-    try {
-        while (session && !same_file(session->file_, file)) session = session->outer_;
-    } catch (const std::exception&) {
-        session = nullptr;
-    }
+    while (session && !same_file(session->file_, file)) session = session->outer_;
     errno = error_before;
     return session;
+}
+
+void HeaderSession::fail_all(int status) noexcept {
+    for (HeaderSession* session = innermost; session; session = session->outer_) session->note_write(status);
 }
 
 HeaderSession* HeaderSession::owner(const std::shared_ptr<HeaderDocument>& document) noexcept {
@@ -56,14 +69,16 @@ HeaderSession* HeaderSession::owner(const std::shared_ptr<HeaderDocument>& docum
 
 std::shared_ptr<HeaderDocument> HeaderSession::document(int& status) {
     status = QUO_OK;
-    if (!document_) {
-        status = HeaderDocument::load(file_.c_str(), document_);
-        if (status != QUO_NO_MEMORY && !(document_ && document_->is_header())) {
-            document_ = HeaderDocument::create();
-            status = document_ ? QUO_OK : QUO_NO_MEMORY;
-        }
-        CallFrame::drop_errno();
+    if (document_) return document_;
+    CallFrame frame{"HeaderSession::document", kSource};
+    const int loaded = HeaderDocument::load_or_create(file_.c_str(), document_);
+    if (loaded != QUO_OK) {
+        status = fail_unread(frame, loaded, file_.c_str());
+        if (document_) status = QUO_OK;  // it stands in; saving it fails
+        return document_;
     }
+    CallFrame::drop_errno();
+    (void)frame.success();
     return document_;
 }
 
@@ -76,14 +91,12 @@ int HeaderSession::commit() noexcept {
     CallFrame frame{"HeaderSession::commit", kSource};
     if (failed_ != QUO_OK) return frame.callee(failed_);
     if (!changed_) return frame.success();
-    try {
+    return guarded(frame, [&] {
         if (!document_->save(file_.c_str())) return frame.fail(QUO_REFUSED, "File writing failed!");
-    } catch (const std::exception&) {
-        return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
-    }
-    CallFrame::drop_errno();
-    changed_ = false;
-    return frame.success();
+        CallFrame::drop_errno();
+        changed_ = false;
+        return frame.success();
+    });
 }
 
 }  // namespace quo

@@ -9,7 +9,12 @@
 
 namespace quo {
 
+class CallFrame;
 class HeaderDocument;
+
+/** Reports that a header file is there but was not loaded: what the system says of it (errno), then an entry with
+ * the file's name. Returns `status`. */
+int fail_unread(CallFrame& frame, int status, const char* file) noexcept;
 
 /** Keeps one header file in memory while a whole product is read or written: header objects that are read from or
  * written to this file while the session lives share its document. The file is parsed once, at first use, and
@@ -24,24 +29,30 @@ public:
 
     /** Saves what the objects have written; with nothing written the file is not touched. What is not committed is
      * dropped with the session.
-     * @return 0; 1 when the file cannot be saved; the status of a write that left the document incomplete, which
-     * is then not saved. The old file stays whole. */
+     * @return 0; 1 when the file cannot be saved or could not be read; the status of a write that left the
+     * document incomplete, which is then not saved. The old file stays whole. */
     [[nodiscard]] int commit() noexcept;
 
-    /** The innermost session for a file, or null. */
-    static HeaderSession* find(const char* file) noexcept;
+    /** The innermost session for a file, or null. Throws std::bad_alloc: an object that missed its session would
+     * be saved by itself. */
+    static HeaderSession* find(const char* file);
     /** The session that a document belongs to, or null. */
     static HeaderSession* owner(const std::shared_ptr<HeaderDocument>& document) noexcept;
 
+    /** Lets no open session of this thread commit any more, which then gives `status`: for what failed before it
+     * could be told to whose file it belongs. */
+    static void fail_all(int status) noexcept;
+
     /** The file's document, parsed at the first call; null, and 7 in `status`, when it does not fit into memory. A
-     * missing or foreign file gives a fresh document. */
+     * missing or foreign file gives a fresh document, and one that cannot be read a document that only stands in.
+     */
     std::shared_ptr<HeaderDocument> document(int& status);
     /** Notes that an object was written, with its status. */
     void note_write(int status) noexcept;
 
 private:
-    HeaderSession* outer_;
     std::string file_;
+    HeaderSession* outer_;
     std::shared_ptr<HeaderDocument> document_;
     int failed_ = QUO_OK;
     bool changed_ = false;

@@ -3,20 +3,23 @@
 #include <algorithm>
 #include <atomic>
 #include <cstdio>
-#include <exception>
 #include <limits>
 #include <string_view>
 #include <utility>
 #include <vector>
 
 #include "diagnosticslib/call_frame.h"
+#include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_document.h"
+#include "quorelxmllib/header_session.h"
+#include "quorelxmllib/header_stream.h"
 #include "quorelxmllib/legacy_list.h"
 #include "quorelxmllib/xml_text.h"
 #include "sarutillib/bounded_text.h"
 #include "sarutillib/number_text.h"
 
 using quo::CallFrame;
+using quo::guarded;
 using quo::HeaderDocument;
 
 namespace {
@@ -29,16 +32,6 @@ constexpr std::size_t kDescriptionRoom = 2048;
 constexpr int kPrecision = 15;
 
 std::atomic<bool> exact_numbers = false;
-
-/** Runs an operation whose only exception is a failed allocation. */
-template <typename Operation>
-int guarded(quo::CallerFrame frame, Operation operation) noexcept {
-    try {
-        return operation();
-    } catch (const std::exception&) {
-        return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
-    }
-}
 
 int out_of_memory(quo::CallerFrame frame) noexcept {
     return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
@@ -62,9 +55,9 @@ void convert(const char* text, float& value) noexcept { value = static_cast<floa
 
 /** Reads up to `count` values from the `val` children of an element; returns how many it had. */
 template <typename T>
-int read_children(xmlNode* node, T* values, int count) noexcept {
+int read_children(const xmlNode* node, T* values, int count) {
     int read = 0;
-    for (xmlNode* child = node->children; child && read < count; child = child->next)
+    for (const xmlNode* child = node->children; child && read < count; child = child->next)
         if (quo::is_named(child, "val")) convert(quo::NodeText{child}.c_str(), values[read++]);
     return read;
 }
@@ -87,6 +80,29 @@ bool read_numbers(const HeaderDocument& document, int channel, std::string_view 
 }  // namespace
 
 // --- the document as a whole ------------------------------------------------------------------------------------
+
+struct quorelxml::Mirror {
+    /** Whether the document is a header, and if so what it says of itself. 0; 1 for another document, or none; 7,
+     * which tells nothing of the document. */
+    static int refresh(quorelxml& self) noexcept {
+        if (!self.document_) return QUO_REFUSED;
+        CallFrame frame{"quorelxml::isRecognized", kSource};
+        const xmlNode* number = self.document_->find(kNumberOfChannels);
+        const xmlNode* description = self.document_->find(kDescription);
+        if (self.debug_ && !number) print_missing("/QuorelXmlDoc/NumberOfChannels");
+        if (self.debug_ && !description) print_missing("/QuorelXmlDoc/Description");
+        return guarded(frame, [&] {
+            if (number) self.number_of_channels_ = quo::scan_int32(quo::NodeText{number}).value;
+            if (description) self.mirrorDescription(quo::NodeText{description});
+            return number && description ? frame.success() : frame.silent(QUO_REFUSED);
+        });
+    }
+    /** The same, with a fresh document in the place of another one. 0 or 7. */
+    static int refresh_or_create(quorelxml& self) noexcept {
+        const int status = refresh(self);
+        return status == QUO_REFUSED ? self.createDocument() : status;
+    }
+};
 
 quorelxml::quorelxml() noexcept = default;
 
@@ -121,8 +137,10 @@ int quorelxml::initXmlFile(const char* file_name) noexcept {
     (void)clean();
     const int stored = storeFileName(file_name);
     (void)parse();
-    if (!isRecognized())
-        if (const int status = createDocument()) return frame.callee(status);
+    if (const int status = Mirror::refresh_or_create(*this)) {
+        document_.reset();
+        return frame.callee(status);
+    }
     return stored ? frame.callee(stored) : frame.success();
 }
 
@@ -132,27 +150,15 @@ int quorelxml::parse() noexcept {
         document_.reset();
         irreplaceable_ = true;  // also when the next line throws
         const int status = HeaderDocument::load(file_name_.c_str(), document_);
-        CallFrame::drop_errno();  // a missing file is no error here
         irreplaceable_ = status == QUO_NO_MEMORY;
-        if (irreplaceable_) return frame.fail(status, "Header file does not fit into memory");
+        unreadable_ = status == QUO_READ_FAILED;
+        if (irreplaceable_ || unreadable_) return quo::fail_unread(frame, status, file_name_.c_str());
+        CallFrame::drop_errno();  // a missing file is no error here
         return status ? frame.silent(status) : frame.success();
     });
 }
 
-bool quorelxml::isRecognized() noexcept {
-    if (!document_) return false;
-    CallFrame frame{"quorelxml::isRecognized", kSource};
-    xmlNode* number = document_->find(kNumberOfChannels);
-    xmlNode* description = document_->find(kDescription);
-    if (debug_ && !number) print_missing("/QuorelXmlDoc/NumberOfChannels");
-    if (debug_ && !description) print_missing("/QuorelXmlDoc/Description");
-    const int status = guarded(frame, [&] {
-        if (number) number_of_channels_ = quo::scan_int32(quo::NodeText{number}).value;
-        if (description) mirrorDescription(quo::NodeText{description});
-        return frame.success();
-    });
-    return status == QUO_OK && number && description;
-}
+bool quorelxml::isRecognized() noexcept { return Mirror::refresh(*this) == QUO_OK; }
 
 void quorelxml::mirrorDescription(std::string_view text) {
     char cut[kDescriptionRoom];
@@ -163,7 +169,7 @@ int quorelxml::createDocument() noexcept {
     CallFrame frame{"quorelxml::createDocument", kSource};
     return guarded(frame, [&] {
         if (irreplaceable_) return frame.fail(QUO_NO_MEMORY, "Header file does not fit into memory");
-        document_ = HeaderDocument::create();
+        document_ = HeaderDocument::create(unreadable_);
         if (!document_) return out_of_memory(frame);
         CallFrame::drop_errno();
         number_of_channels_ = 0;
@@ -174,7 +180,7 @@ int quorelxml::createDocument() noexcept {
 
 int quorelxml::clean() noexcept {
     document_.reset();
-    irreplaceable_ = false;
+    irreplaceable_ = unreadable_ = false;
     return QUO_OK;
 }
 
@@ -293,8 +299,7 @@ bool quorelxml::fieldHasCount(int channel, const char* field, int count) const {
 int quorelxml::createChannel(int channel) noexcept {
     CallFrame frame{"quorelxml::createChannel", kSource};
     return guarded(frame, [&] {
-        if (!isRecognized())
-            if (const int status = createDocument()) return frame.callee(status);
+        if (const int status = Mirror::refresh_or_create(*this)) return frame.callee(status);
         if (document_->first(channel, "")) return frame.success();
         // A file's count is not to be trusted to leave room for one more.
         if (number_of_channels_ < std::numeric_limits<std::int32_t>::max()) ++number_of_channels_;
@@ -349,7 +354,7 @@ int quorelxml::setFormat(int count, int type) {
 // --- reading ----------------------------------------------------------------------------------------------------
 
 /** What the typed readers and writers share. */
-struct quorelxml::Operations {
+struct quorelxml::Values {
     /** Tells the report, in debug mode, that a field is not there. */
     static int missing(const quorelxml& self, const Reading& reading) {
         if (!self.debug_) return QUO_REFUSED;
@@ -364,11 +369,13 @@ struct quorelxml::Operations {
     static int read(const quorelxml& self, const Reading& reading, T* values, int count) noexcept {
         CallFrame frame{reading.function, kSource};
         if (!reading.field || (!values && count > 0)) return frame.fail(QUO_REFUSED, "Null argument");
-        const HeaderDocument* document = self.document_.get();
-        if (!document || !read_numbers(*document, reading.channel, reading.field, values, count))
-            return frame.silent(missing(self, reading));
-        CallFrame::drop_errno();
-        return frame.success();
+        return guarded(frame, [&] {
+            const HeaderDocument* document = self.document_.get();
+            if (!document || !read_numbers(*document, reading.channel, reading.field, values, count))
+                return frame.silent(missing(self, reading));
+            CallFrame::drop_errno();
+            return frame.success();
+        });
     }
 
     /** Sets the texts of a field's elements, which are made where they are missing. `text_of(i)` is the i-th. */
@@ -417,13 +424,13 @@ struct quorelxml::Operations {
 };
 
 int quorelxml::readInt(int channel, const char* field, std::int32_t* values, int count) noexcept {
-    return Operations::read(*this, {"quorelxml::readInt", "int", channel, field}, values, count);
+    return Values::read(*this, {"quorelxml::readInt", "int", channel, field}, values, count);
 }
 int quorelxml::readFloat(int channel, const char* field, float* values, int count) noexcept {
-    return Operations::read(*this, {"quorelxml::readFloat", "float", channel, field}, values, count);
+    return Values::read(*this, {"quorelxml::readFloat", "float", channel, field}, values, count);
 }
 int quorelxml::readDouble(int channel, const char* field, double* values, int count) noexcept {
-    return Operations::read(*this, {"quorelxml::readDouble", "double", channel, field}, values, count);
+    return Values::read(*this, {"quorelxml::readDouble", "double", channel, field}, values, count);
 }
 
 int quorelxml::readString(int channel, const char* field, char* const* values, int count) noexcept {
@@ -440,26 +447,53 @@ int quorelxml::readString(int channel, const char* field, char* const* values, i
         std::vector<xmlNode*> nodes;
         if (document_) nodes = document_->all(channel, field, wanted);
         if (!document_ || nodes.size() < wanted)
-            return frame.silent(Operations::missing(*this, {kFunction, "string", channel, field}));
+            return frame.silent(Values::missing(*this, {kFunction, "string", channel, field}));
         for (std::size_t i = 0; i < wanted; ++i) quo::copy_bounded(values[i], room, quo::NodeText{nodes[i]});
         return frame.success();
+    });
+}
+
+int quorelxml::readTexts(int channel, const char* field,
+                         const std::function<void(std::string_view)>& see) noexcept {
+    CallFrame frame{"quorelxml::readTexts", kSource};
+    if (!field) return frame.fail(QUO_REFUSED, "Null argument");
+    return guarded(frame, [&] {
+        if (document_)
+            document_->visit(channel, field, [&](const xmlNode* node) {
+                see(quo::NodeText{node});
+                return true;
+            });
+        return frame.success();
+    });
+}
+
+int quorelxml::readTexts(const char* file_name, int channel, const char* field,
+                         const std::function<void(std::string_view)>& see) noexcept {
+    CallFrame frame{"quorelxml::readTexts", kSource};
+    if (!file_name || !field) return frame.fail(QUO_REFUSED, "Null argument");
+    return guarded(frame, [&] {
+        const int status = quo::stream_texts(file_name, channel, field, see);
+        if (status == QUO_READ_FAILED || status == QUO_NO_MEMORY)
+            return quo::fail_unread(frame, status, file_name);
+        CallFrame::drop_errno();
+        return status ? frame.silent(status) : frame.success();
     });
 }
 
 // --- writing ----------------------------------------------------------------------------------------------------
 
 int quorelxml::writeInt(int channel, const char* field, const std::int32_t* values, int count) noexcept {
-    return Operations::write_numbers(*this, "quorelxml::writeInt", channel, field, values, count,
-                                     [](std::int32_t value) { return quo::format_int(value); });
+    return Values::write_numbers(*this, "quorelxml::writeInt", channel, field, values, count,
+                                 [](std::int32_t value) { return quo::format_int(value); });
 }
 int quorelxml::writeFloat(int channel, const char* field, const float* values, int count) noexcept {
-    return Operations::write_numbers(
+    return Values::write_numbers(
         *this, "quorelxml::writeFloat", channel, field, values, count,
-        [this](float value) { return Operations::number_text(*this, static_cast<double>(value)); });
+        [this](float value) { return Values::number_text(*this, static_cast<double>(value)); });
 }
 int quorelxml::writeDouble(int channel, const char* field, const double* values, int count) noexcept {
-    return Operations::write_numbers(*this, "quorelxml::writeDouble", channel, field, values, count,
-                                     [this](double value) { return Operations::number_text(*this, value); });
+    return Values::write_numbers(*this, "quorelxml::writeDouble", channel, field, values, count,
+                                 [this](double value) { return Values::number_text(*this, value); });
 }
 
 int quorelxml::writeString(int channel, const char* field, const char* const* values, int count) noexcept {
@@ -472,7 +506,7 @@ int quorelxml::writeString(int channel, const char* field, const char* const* va
             if (!text) return frame.fail(QUO_REFUSED, "Text cannot be stored in XML");
             texts.push_back(std::move(*text));
         }
-        return Operations::write(*this, frame, channel, field, count,
-                                 [&](std::size_t i) { return std::string_view{texts[i]}; });
+        return Values::write(*this, frame, channel, field, count,
+                             [&](std::size_t i) { return std::string_view{texts[i]}; });
     });
 }

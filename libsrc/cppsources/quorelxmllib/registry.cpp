@@ -1,5 +1,4 @@
 #include <algorithm>
-#include <exception>
 #include <new>
 #include <span>
 #include <string_view>
@@ -8,6 +7,7 @@
 #include "diagnosticslib/call_frame.h"
 #include "quo_base/quorelxml_v2.h"
 #include "quorelxmllib/field_table.h"
+#include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_document.h"
 #include "quorelxmllib/header_session.h"
 #include "quorelxmllib/xml_text.h"
@@ -15,21 +15,13 @@
 #include "sarutillib/file_io.h"
 
 using quo::CallFrame;
+using quo::guarded;
 using quo::HeaderSession;
 
 namespace {
 
 constexpr const char* kSource = "quorelxml_v2";
 constexpr std::size_t kNameRoom = 512;
-
-template <typename Operation>
-int guarded(quo::CallerFrame frame, Operation operation) noexcept {
-    try {
-        return operation();
-    } catch (const std::exception&) {
-        return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
-    }
-}
 
 std::span<char* const> texts_of(const parElement& element, char* const& single) {
     if (!element.text_array) return {&single, 1};
@@ -287,6 +279,8 @@ int GeneralSAR_BaseXML::writeAuxiliaryFile(const char* file, int channel, const 
     int status = setAuxiliaryFile(file, channel, section);
     if (status == QUO_OK) status = writeAuxiliaryFile();
     (void)unsetAuxiliaryFile();
+    // Without this object the file of a session would be neither the old one nor the new one.
+    if (status == QUO_NO_MEMORY) HeaderSession::fail_all(status);
     return status ? frame.callee(status) : frame.success();
 }
 

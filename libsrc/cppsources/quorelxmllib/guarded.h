@@ -1,0 +1,23 @@
+#ifndef QUO_GUARDED_H
+#define QUO_GUARDED_H
+
+#include <exception>
+
+#include "diagnosticslib/call_frame.h"
+
+namespace quo {
+
+/** Runs an operation whose only exception is a failed allocation, which becomes the reported status 7. */
+template <typename Operation>
+int guarded(CallerFrame frame, Operation operation) noexcept {
+    try {
+        return operation();
+    } catch (const std::exception&) {
+        CallFrame::drop_errno();
+        return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
+    }
+}
+
+}  // namespace quo
+
+#endif

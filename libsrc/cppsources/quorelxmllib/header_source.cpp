@@ -1,0 +1,47 @@
+#include "quorelxmllib/header_source.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+
+#include "quo_base/quorelxml_v2.h"
+
+namespace quo {
+namespace {
+
+/** The status of a file that a system call failed on: whatever is not certain to be absent may be whole. */
+int unread(int error) noexcept {
+    errno = error;
+    if (error == ENOENT || error == ENOTDIR) return QUO_REFUSED;
+    return error == ENOMEM || error == EFBIG ? QUO_NO_MEMORY : QUO_READ_FAILED;
+}
+
+}  // namespace
+
+int HeaderSource::open(const char* file) noexcept {
+    int number = -1;
+    do number = ::open(file, O_RDONLY | O_CLOEXEC);
+    while (number < 0 && errno == EINTR);
+    file_ = Descriptor{number};
+    struct stat found {};
+    if (!file_ || ::fstat(number, &found) != 0) return unread(errno);
+    if (S_ISDIR(found.st_mode)) return unread(EISDIR);
+    return found.st_size > quorelxml::kMostFileBytes ? unread(EFBIG) : QUO_OK;
+}
+
+int HeaderSource::read(void* source, char* buffer, int length) noexcept {
+    auto& self = *static_cast<HeaderSource*>(source);
+    ssize_t got = 0;
+    do got = ::read(self.file_.get(), buffer, static_cast<std::size_t>(length));
+    while (got < 0 && errno == EINTR);
+    if (got > 0) self.bytes_ += got;
+    const int error = got < 0 ? errno : self.bytes_ > quorelxml::kMostFileBytes ? EFBIG : 0;
+    if (self.error_ == 0) self.error_ = error;
+    return error != 0 ? -1 : static_cast<int>(got);
+}
+
+int HeaderSource::status() const noexcept { return error_ != 0 ? unread(error_) : QUO_OK; }
+
+}  // namespace quo

@@ -1,0 +1,59 @@
+#ifndef QUO_HEADER_SOURCE_H
+#define QUO_HEADER_SOURCE_H
+
+#include <libxml/parser.h>
+#include <libxml/xmlerror.h>
+
+#include <cstdint>
+
+#include "sarutillib/file_io.h"
+
+namespace quo {
+
+/** How header files are parsed: without blanks between elements, network or entities. */
+constexpr int kHeaderOptions = XML_PARSE_NOBLANKS | XML_PARSE_COMPACT | XML_PARSE_NONET;
+
+/** While it lives, libxml2 prints nothing on this thread, and a lack of memory is noted, which later errors hide.
+ */
+class XmlErrors {
+public:
+    XmlErrors() noexcept : handler_{xmlStructuredError}, context_{xmlStructuredErrorContext} {
+        xmlSetStructuredErrorFunc(this, [](void* self, xmlError* error) {
+            if (error->code == XML_ERR_NO_MEMORY) static_cast<XmlErrors*>(self)->out_of_memory_ = true;
+        });
+    }
+    ~XmlErrors() { xmlSetStructuredErrorFunc(context_, handler_); }
+    XmlErrors(const XmlErrors&) = delete;
+    XmlErrors& operator=(const XmlErrors&) = delete;
+
+    [[nodiscard]] bool out_of_memory() const noexcept { return out_of_memory_; }
+
+private:
+    xmlStructuredErrorFunc handler_;
+    void* context_;
+    bool out_of_memory_ = false;
+};
+
+/** A header file as libxml2 reads it. */
+class HeaderSource {
+public:
+    /** 0; 1 when there is no file; 4 when it is there but cannot be opened, 7 when it is too large: errno tells.
+     */
+    int open(const char* file) noexcept;
+    /** libxml2's read call; `source` is the HeaderSource. */
+    static int read(void* source, char* buffer, int length) noexcept;
+
+    /** How reading went so far: 0, or 4 or 7 with errno set. */
+    [[nodiscard]] int status() const noexcept;
+    /** Bytes read so far. */
+    [[nodiscard]] std::int64_t bytes() const noexcept { return bytes_; }
+
+private:
+    Descriptor file_;
+    std::int64_t bytes_ = 0;
+    int error_ = 0;  // the first failure
+};
+
+}  // namespace quo
+
+#endif
