@@ -2,6 +2,7 @@
 #define QUO_BASE_DATAFILE_H
 
 #include <memory>
+#include <optional>
 
 #include "quo_base/api.h"
 #include "quo_base/quorelxml_v2.h"
@@ -195,9 +196,10 @@ private:
 
 /** A raster file with a sliding buffer and typed block access.
  *
- * Reports nothing: operations return counts or nothing, and requests that cannot be met are ignored. The buffer
- * keeps the target of a seek in its middle (writing) or `keep` bytes after its start (reading), so that small
- * steps back and forth stay in memory; what is read and written is what a plain file would give. */
+ * Reports nothing: operations return counts or nothing, and requests that cannot be met are ignored; what the
+ * system refused is kept by status(). The buffer keeps the target of a seek in its middle (writing) or `keep`
+ * bytes after its start (reading), so that small steps back and forth stay in memory; what is read and written is
+ * what a plain file would give. */
 class QUO_BASE_API BufferFile : public RasterDescription {
 public:
     /** How the file is open. */
@@ -249,17 +251,27 @@ public:
     /** Whether it is open for writing. */
     [[nodiscard]] bool is_writing() const { return mode_ == WRITE || mode_ == READ_WRITE; }
 
-    /** Opens the raster; READ_WRITE needs it to exist. Any other mode, or a file that cannot be opened, leaves it
-     * closed. A file that is open is closed first. */
+    /** Opens the raster; READ_WRITE needs it to exist. A file that is open is closed first, and one that cannot be
+     * opened leaves it closed. Any other mode opens and closes nothing: a file that is open goes to its start. */
     void open(int mode);
-    /** Gives the open file a buffer of `size` bytes and goes to its start; reading, `keep` bytes (at most size -
-     * 1) of what was passed stay when it slides. Ignored for a closed file and for size < 1; without memory the
+    /** Gives the open file a buffer of `size` bytes. A file that is written stays at its place; in mode READ it
+     * goes to its start, and `keep` bytes (at most size - 1) of what was passed stay when the buffer slides.
+     * Ignored for a closed file, for size < 1 and while an older buffer cannot be written; without memory the
      * file is unbuffered. */
     void initbuffer(int size, int keep);
-    /** Writes what is pending and closes the file; the buffer is released. */
+    /** Writes what is pending and closes the file; the buffer is released. status() tells afterwards whether
+     * everything has arrived. */
     void close();
-    /** Moves to another place; a place before the start is ignored. Deliberate: an offset of 0 changes nothing,
-     * whatever the type. */
+    /** What became of everything asked for since open(), the closing of the file before included: 0, or the
+     * status of the first failure, which stays until the next open(). 4 where the system refused to read (the end
+     * of the file is no failure, unless a block or a single sample lies beyond it); 5 where bytes could not be
+     * written: at once, or later what a buffer held, by seek(), close() or any other call; 7 without memory; 9
+     * where the file could not be opened. Requests that are ignored leave it alone. */
+    [[nodiscard]] int status() const { return status_; }
+    /** The system's error number that came with status(); 0 where it gave none. */
+    [[nodiscard]] int systemError() const { return error_; }
+    /** Moves to another place; a place before the start is ignored. An offset of 0 changes nothing, whatever the
+     * type. What a buffer held and could not be written is given up when the place leaves the buffer. */
     void seek(int64_t offset, int type);
     /** The place of the next byte; deliberate: with a buffer in mode READ_WRITE, the place of the buffer's start.
      */
@@ -330,17 +342,24 @@ private:
     [[nodiscard]] int64_t place() const;
     void moveTo(int64_t target);
     void dropBuffer(int64_t next);
-    void loadWindow(int64_t start);
+    bool loadWindow(int64_t start);
+    void note(int status);
     bool flush();
+    [[nodiscard]] std::optional<int64_t> end();
+    bool hasWindow();
     void markWritten(int64_t first, int64_t last);
     bool advanceForReading();
+    int64_t readDirectly(char* to, int64_t n);
+    int64_t writeDirectly(const char* src, int64_t n);
     int64_t slideForWriting(const char* src, int64_t n);
 
     char name_[512] = "";
     std::unique_ptr<quo::RasterStream> stream_;
     std::unique_ptr<char[]> buffer_;
     int mode_ = NOT_OPEN;
-    int64_t start_ = 0;  // file offset of the buffer's first byte; unbuffered, the current place
+    int status_ = 0, error_ = 0;  // of the first failure since open()
+    bool loaded_ = false;         // the buffer holds what the file has there; else only the place counts
+    int64_t start_ = 0;           // file offset of the buffer's first byte; unbuffered, the current place
     int64_t size_ = 0, keep_ = 0, cursor_ = 0, fill_ = 0;
     int64_t dirty_first_ = 0, dirty_last_ = 0;  // bytes of the buffer that the file does not have yet
 };

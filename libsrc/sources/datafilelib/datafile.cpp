@@ -192,7 +192,7 @@ int DataFile::close() {
 // all of it is still pending.
 int DataFile::flushBuffer() {
     const auto pending = static_cast<std::size_t>(cursor_);
-    if (pending_ && stream_->write_at(position_, buffer_.get(), pending) != pending) return QUO_WRITE_FAILED;
+    if (pending_ && stream_->write_at(position_, buffer_.get(), pending).bytes != pending) return QUO_WRITE_FAILED;
     pending_ = false;
     position_ += cursor_;
     cursor_ = fill_ = 0;
@@ -201,7 +201,7 @@ int DataFile::flushBuffer() {
 
 int DataFile::refill() {
     fill_ = static_cast<std::int32_t>(
-        stream_->read_at(position_, buffer_.get(), static_cast<std::size_t>(BufferSize)));
+        stream_->read_at(position_, buffer_.get(), static_cast<std::size_t>(BufferSize)).bytes);
     cursor_ = 0;
     return fill_;
 }
@@ -264,7 +264,7 @@ int DataFile::read(char* dst, int64_t n) {
     quo::CallFrame frame{"DataFile::read", kSource};
     if (!is_open() || state_ == 1 || n < 0) return frame.fail(QUO_REFUSED, "The file is not open for reading");
     if (buffer_) return finish(frame, readBuffered(dst, n));
-    if (stream_->read_at(position_, dst, static_cast<std::size_t>(n)) != static_cast<std::size_t>(n)) {
+    if (stream_->read_at(position_, dst, static_cast<std::size_t>(n)).bytes != static_cast<std::size_t>(n)) {
         return frame.fail(QUO_READ_FAILED, kReadFailed);
     }
     position_ += n;
@@ -284,7 +284,7 @@ int DataFile::writeBuffered(const char* src, int64_t n) {
 
 int DataFile::writeDirectly(const char* src, int64_t n) {
     const auto bytes = static_cast<std::size_t>(n);
-    if (stream_->write_at(position_, src, bytes) != bytes) return QUO_WRITE_FAILED;
+    if (stream_->write_at(position_, src, bytes).bytes != bytes) return QUO_WRITE_FAILED;
     position_ += n;
     return QUO_OK;
 }

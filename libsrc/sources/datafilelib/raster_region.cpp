@@ -61,7 +61,7 @@ private:
             const auto bytes = static_cast<std::size_t>(pieces * region_.piece);
             char* room = to_ + done * layout_.memory_piece;
             char* upper = room + pieces * (layout_.memory_piece - region_.piece);
-            if (stream_.read_at(region_.first + done * region_.distance, upper, bytes) != bytes)
+            if (stream_.read_at(region_.first + done * region_.distance, upper, bytes).bytes != bytes)
                 return QUO_READ_FAILED;
             if (layout_.kernel) {
                 layout_.kernel(upper, room, static_cast<std::size_t>(pieces * layout_.samples), layout_.swap);
@@ -80,7 +80,7 @@ private:
         for (std::int64_t done = 0; done < region_.count; done += at_once) {
             const std::int64_t pieces = std::min(at_once, region_.count - done);
             const auto bytes = static_cast<std::size_t>(span(pieces));
-            if (stream_.read_at(region_.first + done * region_.distance, scratch.data(), bytes) != bytes) {
+            if (stream_.read_at(region_.first + done * region_.distance, scratch.data(), bytes).bytes != bytes) {
                 return QUO_READ_FAILED;
             }
             for (std::int64_t i = 0; i < pieces; ++i) {
@@ -114,8 +114,8 @@ int copy_bytes(const RasterStream& from, const RasterStream& to) {
     if (!chunk) return QUO_NO_MEMORY;
     for (std::int64_t done = 0; done < *length; done += kChunk) {
         const auto bytes = static_cast<std::size_t>(std::min(kChunk, *length - done));
-        if (from.read_at(done, chunk.data(), bytes) != bytes) return QUO_READ_FAILED;
-        if (to.write_at(done, chunk.data(), bytes) != bytes) return QUO_WRITE_FAILED;
+        if (from.read_at(done, chunk.data(), bytes).bytes != bytes) return QUO_READ_FAILED;
+        if (to.write_at(done, chunk.data(), bytes).bytes != bytes) return QUO_WRITE_FAILED;
     }
     return QUO_OK;
 }
@@ -180,7 +180,7 @@ int write_region(const RasterStream& stream, const RasterRegion& region, const R
             }
         }
         const auto bytes = static_cast<std::size_t>(pieces * region.piece);
-        if (stream.write_at(region.first + done * region.distance, scratch.data(), bytes) != bytes) {
+        if (stream.write_at(region.first + done * region.distance, scratch.data(), bytes).bytes != bytes) {
             return QUO_WRITE_FAILED;
         }
     }
