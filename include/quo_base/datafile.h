@@ -38,6 +38,7 @@ enum RasterCellType {
 namespace quo {
 class RasterStream;
 struct RasterRegion;
+struct RegionLayout;
 }  // namespace quo
 
 /** The description that both raster classes hold. Section "RasterInfo" of the side file, six integers. */
@@ -128,11 +129,12 @@ public:
     int setFilename(const char* file_name);
 
     char FileName[512] = "";  ///< raster path
-    int32_t BufferSize = 0;   ///< bytes of the buffer; 0: unbuffered
+    int32_t BufferSize = 0;   ///< bytes of the buffer, taken by open(); 0: unbuffered
 
 private:
     friend class BufferIO;
 
+    [[nodiscard]] std::string path() const;
     [[nodiscard]] std::string sideFile() const;
     int refill();
     int flushBuffer();
@@ -142,10 +144,13 @@ private:
     int seekWriting(int64_t offset);
     int seekReading(int64_t offset, int whence);
     int prepareRegion(int64_t next);
+    int read(const quo::RasterRegion& region, const quo::RegionLayout& layout, char* dst, int64_t next);
+    int write(const quo::RasterRegion& region, const quo::RegionLayout& layout, const char* src, int64_t next);
 
     std::unique_ptr<quo::RasterStream> stream_;
     std::unique_ptr<char[]> buffer_;
     int64_t position_ = 0;
+    int32_t buffer_size_ = 0;  // bytes of buffer_, whatever BufferSize says meanwhile
     int32_t cursor_ = 0, fill_ = 0, state_ = 0;
     bool pending_ = false;  // the buffer holds bytes before its cursor that the file does not have yet
 };

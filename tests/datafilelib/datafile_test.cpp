@@ -9,6 +9,7 @@
 #include <cstring>
 #include <filesystem>
 #include <limits>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -203,7 +204,8 @@ const Sequence kSequences[] = {
 };
 
 // The contents are those of a plain file. Once, in mode 3, bytes that were only read were written back where the
-// buffer ended, and pending ones were lost to the next read.
+// buffer ended, and pending ones were lost to the next read; and a size raised by hand while the file was open ran
+// over the end of the buffer.
 TEST_F(DataFileBytes, AreMovedAsInAPlainFile) {
     const test::CapturedStderr silent;
     for (const Sequence& sequence : kSequences) {
@@ -213,6 +215,7 @@ TEST_F(DataFileBytes, AreMovedAsInAPlainFile) {
             std::string plain = sequence.mode == 1 ? "" : content_;
             open(sequence.mode, buffer);
             EXPECT_EQ(file_.is_buffered(), buffer > 0 ? 1 : 0);
+            file_.BufferSize = 9 * buffer;
             EXPECT_EQ(file_.is_writing(), sequence.mode == 3 ? 2 : sequence.mode > 0 ? 1 : 0);
             for (const Step& step : sequence.steps) {
                 const auto n = static_cast<std::size_t>(step.n), before = static_cast<std::size_t>(file_.tell());
@@ -286,10 +289,35 @@ TEST_F(DataFileBytes, WhatCannotBeOpenedGivesNine) {
     file_.setFilename(report_.folder().path().c_str());
     EXPECT_EQ(file_.open(0), 9) << "a folder is no raster";
     EXPECT_EQ(file_.exists(), 0);
+    std::fill(std::begin(file_.FileName), std::end(file_.FileName), 'n');  // by hand, without an end
+    EXPECT_EQ(file_.open(0), 9);
+    EXPECT_EQ(file_.exists(), 0);
     for (const std::string& message : report_.messages("ERROR")) {
         EXPECT_THAT(message, testing::AnyOf("File not opened!", std::string{std::strerror(ENOENT)},
                                             std::string{std::strerror(EISDIR)}));
     }
+}
+
+// The entry names the call that failed, and the line of it that did; who called it stands in the call tree. Once
+// all of them bore the name of the region's function and one helper's line.
+TEST_F(DataFileBytes, FailuresOfRegionsNameTheCallAndItsLine) {
+    const test::CapturedStderr silent;
+    char bytes[120] = {};
+    describe(file_, 9, 3, INT16, 0, 2, 0);
+    BufferIO region{&file_, 0, 3, 0, 9, INT16}, outside{&file_, 1, 3, 0, 9, INT16};
+    open(0, 0);
+    EXPECT_EQ(region.readbuffer(bytes, 3) + region.readprefix(bytes), 4 + 4);
+    EXPECT_EQ(outside.readbuffer(bytes, 3) + outside.writebuffer(bytes), 1 + 1);
+    std::vector<std::string> places;
+    std::set<int> lines;
+    for (const test::ReportEntry& entry : report_.entries()) {
+        places.push_back(entry.kind + " " + entry.function);
+        lines.insert(entry.line);
+    }
+    EXPECT_THAT(places, testing::ElementsAre("ERROR DataFile::read", "ERROR_CALL_TREE BufferIO::readbuffer",
+                                             "ERROR DataFile::read", "ERROR_CALL_TREE BufferIO::readprefix",
+                                             "ERROR BufferIO::readbuffer", "ERROR BufferIO::writebuffer"));
+    EXPECT_EQ(lines.size(), 5U);
 }
 
 // A write that is cut short says so in every way to write, and once there is room again nothing is missing.

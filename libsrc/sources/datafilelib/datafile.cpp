@@ -66,22 +66,29 @@ private:
     bool complete_ = true;
 };
 
-// Statuses of a region transfer as entries of the report.
-int finish(quo::CallFrame& frame, int status) {
+const char* message_of(int status) {
     switch (status) {
-        case QUO_OK:
-            return frame.success();
         case QUO_READ_FAILED:
-            return frame.fail(status, kReadFailed);
+            return kReadFailed;
         case QUO_WRITE_FAILED:
-            return frame.fail(status, kWriteFailed);
+            return kWriteFailed;
         case QUO_NO_MEMORY:
-            return frame.fail(status, "Memory allocation failure");
+            return "Memory allocation failure";
         case QUO_NOT_OPENED:
-            return frame.fail(status, "File not opened!");
+            return "File not opened!";
         default:
-            return frame.fail(status, "The request does not fit the raster");
+            return "The request does not fit the raster";
     }
+}
+
+// The status of a transfer as an entry of the report, which names the caller's line.
+int finish(quo::CallFrame& frame, int status, int line = __builtin_LINE()) {
+    return status == QUO_OK ? frame.success(line) : frame.fail(status, message_of(status), line);
+}
+
+// The same for a call that has reported its own failure.
+int pass(quo::CallFrame& frame, int status, int line = __builtin_LINE()) {
+    return status == QUO_OK ? frame.success(line) : frame.callee(status, line);
 }
 
 bool converts(int cell_type) { return cell_type >= FLOAT_COMPLEX && cell_type <= INT16; }
@@ -137,7 +144,12 @@ int RasterDescription::writeSection(const char* side_file) {
 DataFile::DataFile() : stream_{std::make_unique<quo::RasterStream>()} {}
 DataFile::~DataFile() { close(); }
 
-std::string DataFile::sideFile() const { return std::string{FileName} + ".hdr"; }
+// Whoever fills the public array by hand may leave out the final NUL: that is no name.
+std::string DataFile::path() const {
+    const std::size_t length = strnlen(FileName, sizeof FileName);
+    return {FileName, length < sizeof FileName ? length : 0};
+}
+std::string DataFile::sideFile() const { return path() + ".hdr"; }
 
 int DataFile::setFilename(const char* file_name) {
     const std::string_view name = quo::text_or_empty(file_name);
@@ -159,13 +171,14 @@ int DataFile::open(int mode) {
         if (const int status = close()) return frame.callee(status);
         BufferSize = wanted;
     }
-    if (!stream_->open(FileName, kModes[mode].how)) return frame.fail(QUO_NOT_OPENED, "File not opened!");
+    if (!stream_->open(path().c_str(), kModes[mode].how)) return frame.fail(QUO_NOT_OPENED, "File not opened!");
     state_ = kModes[mode].state;
     position_ = 0;
     cursor_ = fill_ = 0;
     pending_ = false;
     if (BufferSize > 0) {
         buffer_.reset(new (std::nothrow) char[static_cast<std::size_t>(BufferSize)]);
+        buffer_size_ = BufferSize;
         if (!buffer_) {
             stream_->close();
             return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
@@ -201,7 +214,7 @@ int DataFile::flushBuffer() {
 
 int DataFile::refill() {
     fill_ = static_cast<std::int32_t>(
-        stream_->read_at(position_, buffer_.get(), static_cast<std::size_t>(BufferSize)).bytes);
+        stream_->read_at(position_, buffer_.get(), static_cast<std::size_t>(buffer_size_)).bytes);
     cursor_ = 0;
     return fill_;
 }
@@ -272,7 +285,7 @@ int DataFile::read(char* dst, int64_t n) {
 }
 
 int DataFile::writeBuffered(const char* src, int64_t n) {
-    if (n < BufferSize - cursor_) {
+    if (n < buffer_size_ - cursor_) {
         std::memcpy(buffer_.get() + cursor_, src, static_cast<std::size_t>(n));
         cursor_ += static_cast<std::int32_t>(n);
         pending_ = true;
@@ -299,7 +312,7 @@ int64_t DataFile::tell() const { return buffer_ ? position_ + cursor_ : position
 int DataFile::is_open() const { return stream_->is_open() ? 1 : 0; }
 int DataFile::is_buffered() const { return BufferSize > 0 ? 1 : 0; }
 int DataFile::is_writing() const { return state_; }
-int DataFile::exists() const { return quo::raster_exists(FileName) ? 1 : 0; }
+int DataFile::exists() const { return quo::raster_exists(path().c_str()) ? 1 : 0; }
 
 int DataFile::read_hdr(const char* file_name) {
     quo::CallFrame frame{"DataFile::read_hdr", kSource};
@@ -326,7 +339,7 @@ int DataFile::read_hdr(const char* file_name) {
 int DataFile::write_hdr() {
     quo::CallFrame frame{"DataFile::write_hdr", kSource};
     // Without a name the side file would be some ".hdr" of the working directory.
-    if (FileName[0] == '\0') return frame.fail(QUO_REFUSED, "No raster named");
+    if (path().empty()) return frame.fail(QUO_REFUSED, "No raster named");
     if (writeSection(sideFile().c_str()) != QUO_OK) {
         return frame.fail(QUO_REFUSED, "The raster's side file cannot be written");
     }
@@ -337,7 +350,7 @@ int DataFile::clone(const DataFile* source) {
     quo::CallFrame frame{"DataFile::clone", kSource};
     if (source == this) return frame.success();
     if (const int status = close()) return frame.callee(status);
-    quo::copy_bounded(FileName, source->FileName);
+    quo::copy_bounded(FileName, source->path());
     copyDescription(*source);
     BufferSize = source->BufferSize;
     return frame.success();
@@ -349,7 +362,7 @@ int DataFile::copy(const char* file_name, int overwrite) {
     DataFile target;
     target.clone(this);
     if (target.setFilename(file_name) != QUO_OK) return frame.fail(QUO_REFUSED, "File name too long");
-    if (const int status = quo::copy_raster(FileName, target.FileName, overwrite != 0))
+    if (const int status = quo::copy_raster(path().c_str(), target.FileName, overwrite != 0))
         return finish(frame, status);
     if (const int status = target.write_hdr()) return frame.callee(status);
     return frame.success();
@@ -362,6 +375,20 @@ int DataFile::prepareRegion(int64_t next) {
     position_ = next;
     cursor_ = fill_ = 0;
     return QUO_OK;
+}
+
+int DataFile::read(const quo::RasterRegion& region, const quo::RegionLayout& layout, char* dst, int64_t next) {
+    quo::CallFrame frame{"DataFile::read", kSource};
+    if (const int status = prepareRegion(next)) return finish(frame, status);
+    return finish(frame,
+                  dst ? quo::read_region(*stream_, region, layout, dst) : quo::check_region(*stream_, region));
+}
+
+int DataFile::write(const quo::RasterRegion& region, const quo::RegionLayout& layout, const char* src,
+                    int64_t next) {
+    quo::CallFrame frame{"DataFile::write", kSource};
+    if (const int status = prepareRegion(next)) return finish(frame, status);
+    return finish(frame, quo::write_region(*stream_, region, layout, src));
 }
 
 BufferIO::BufferIO(DataFile* file, int first_sample, int samples, int first_line, int lines, int memory_type)
@@ -385,20 +412,16 @@ int BufferIO::readprefix(char* dst) {
     if (const int status = openForReading()) return frame.callee(status);
     quo::RasterRegion region;
     if (File->state_ == 1 || !prefixRegion(region)) return finish(frame, QUO_REFUSED);
-    if (const int status = File->prepareRegion(quo::line_after(*File, FirstLine, Lines)))
-        return finish(frame, status);
-    return finish(frame,
-                  quo::read_region(*File->stream_, region, {nullptr, 0, region.piece, region.piece, false}, dst));
+    const quo::RegionLayout layout{nullptr, 0, region.piece, region.piece, false};
+    return pass(frame, File->read(region, layout, dst, quo::line_after(*File, FirstLine, Lines)));
 }
 
 int BufferIO::writeprefix(const char* src) {
     quo::CallFrame frame{"BufferIO::writeprefix", kSource};
     quo::RasterRegion region;
     if (!File->is_open() || File->state_ == 0 || !prefixRegion(region)) return finish(frame, QUO_REFUSED);
-    if (const int status = File->prepareRegion(quo::line_after(*File, FirstLine, Lines)))
-        return finish(frame, status);
-    return finish(frame,
-                  quo::write_region(*File->stream_, region, {nullptr, 0, region.piece, region.piece, false}, src));
+    const quo::RegionLayout layout{nullptr, 0, region.piece, region.piece, false};
+    return pass(frame, File->write(region, layout, src, quo::line_after(*File, FirstLine, Lines)));
 }
 
 int BufferIO::readbuffer(char* dst, int width) {
@@ -407,17 +430,12 @@ int BufferIO::readbuffer(char* dst, int width) {
     if (const int status = openForReading()) return frame.callee(status);
     const auto region = quo::region_of_samples(*File, FirstLine, Lines, FirstSample, Samples);
     if (File->state_ == 1 || !region || width < Samples) return finish(frame, QUO_REFUSED);
-    if (const int status = File->prepareRegion(quo::line_after(*File, FirstLine, Lines)))
-        return finish(frame, status);
-
+    // Without a kernel the destination stays as it is: callers ask for pairs that have no conversion, and go on.
     const auto kernel = quo::find_kernel(quo::SampleAccess::kRegionRead, File->CellType, MemoryType);
-    if (!kernel) {  // deliberate: a pair without a conversion is no failure, a region beyond the file is
-        return finish(frame, File->stream_->length().value_or(0) < region->end() ? QUO_READ_FAILED : QUO_OK);
-    }
     const auto size = static_cast<std::int64_t>(quo::sample_size(MemoryType));
-    return finish(frame,
-                  quo::read_region(*File->stream_, *region,
-                                   {kernel, Samples, Samples * size, width * size, File->ByteOrder == 1}, dst));
+    const quo::RegionLayout layout{kernel, Samples, Samples * size, width * size, File->ByteOrder == 1};
+    return pass(frame,
+                File->read(*region, layout, kernel ? dst : nullptr, quo::line_after(*File, FirstLine, Lines)));
 }
 
 int BufferIO::writebuffer(const char* src) { return writebuffer(src, Samples); }
@@ -429,10 +447,7 @@ int BufferIO::writebuffer(const char* src, int width) {
     if (!File->is_open() || File->state_ == 0 || !kernel || !region || width < Samples) {
         return finish(frame, QUO_REFUSED);
     }
-    if (const int status = File->prepareRegion(quo::line_after(*File, FirstLine, Lines)))
-        return finish(frame, status);
     const auto size = static_cast<std::int64_t>(quo::sample_size(MemoryType));
-    return finish(frame,
-                  quo::write_region(*File->stream_, *region,
-                                    {kernel, Samples, Samples * size, width * size, File->ByteOrder == 1}, src));
+    const quo::RegionLayout layout{kernel, Samples, Samples * size, width * size, File->ByteOrder == 1};
+    return pass(frame, File->write(*region, layout, src, quo::line_after(*File, FirstLine, Lines)));
 }

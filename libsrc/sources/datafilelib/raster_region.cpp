@@ -154,10 +154,15 @@ std::int64_t line_after(const RasterDescription& raster, std::int64_t first_line
     return place.value().value_or(raster.HeaderOffset);
 }
 
-int read_region(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout, char* to) {
+int check_region(const RasterStream& stream, const RasterRegion& region) {
     if (region.count == 0 || region.piece == 0) return QUO_OK;
     const auto length = stream.length();
-    if (!length || region.end() > *length) return QUO_READ_FAILED;
+    return length && region.end() <= *length ? QUO_OK : QUO_READ_FAILED;
+}
+
+int read_region(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout, char* to) {
+    if (const int status = check_region(stream, region)) return status;
+    if (region.count == 0 || region.piece == 0) return QUO_OK;
     return RegionReader{stream, region, layout, to}.run();
 }
 

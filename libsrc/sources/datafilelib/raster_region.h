@@ -39,6 +39,9 @@ struct RegionLayout {
     bool swap;                  ///< the file has the other byte order
 };
 
+/** 0, or 4 when the file ends before the region. */
+int check_region(const RasterStream& stream, const RasterRegion& region);
+
 /** Moves a whole region with few large transfers. 0, 4 when the file ends before the region (nothing is touched
  * then), 5, or 7. */
 int read_region(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout, char* to);
