@@ -148,7 +148,7 @@ namespace {
 /** Collects the serializer's small pieces into large writes. */
 class Sink {
 public:
-    explicit Sink(const char* file) : file_{file} { pending_.reserve(kPiece); }
+    explicit Sink(AtomicFile& file) : file_{file} { pending_.reserve(kPiece); }
 
     bool take(std::string_view bytes) {
         if (pending_.size() + bytes.size() > kPiece) flush();
@@ -156,9 +156,10 @@ public:
         pending_ += bytes;  // within the reserved room: cannot throw
         return file_.good();
     }
+    /** Hands over what is still held. */
     bool commit() {
         flush();
-        return file_.good() && file_.commit();
+        return file_.good();
     }
     [[nodiscard]] bool good() const { return file_.good(); }
 
@@ -170,7 +171,7 @@ private:
         pending_.clear();
     }
 
-    AtomicFile file_;
+    AtomicFile& file_;
     std::string pending_;
 };
 
@@ -207,6 +208,11 @@ XmlTree reloaded(xmlDoc* tree) {
 }  // namespace
 
 bool HeaderDocument::save(const char* file) {
+    AtomicFile target{file};
+    return save(target) && target.commit();
+}
+
+bool HeaderDocument::save(AtomicFile& file) {
     const XmlErrors errors;
     Sink sink{file};
     if (!sink.good()) return false;
