@@ -36,6 +36,7 @@ enum RasterCellType {
 };
 
 namespace quo {
+class AtomicFile;
 class RasterStream;
 struct RasterRegion;
 struct RegionLayout;
@@ -70,6 +71,13 @@ protected:
     int readSection(const char* side_file);
     /** Writes it; 0 or a failing status, 1 also for a HeaderOffset that an integer of the file cannot hold. */
     int writeSection(const char* side_file);
+    /** Makes a new raster and its side file, with this description, the files of their names: both or neither. An
+     * older side file keeps its other sections. 0; 1 as writeSection(); 5, 7; 9 where the side file cannot be
+     * replaced. */
+    int commitPair(quo::AtomicFile& raster, const char* side_file);
+    /** Copies a raster and describes the copy in its side file, as commitPair() does; otherwise as
+     * DataFile::copy(). */
+    int copyPair(const char* from, const char* to, bool overwrite);
 
 private:
     int32_t stored_offset_ = 0;  // HeaderOffset as the side file holds it
@@ -121,8 +129,10 @@ public:
     /** Takes over another file's name and description, buffer size included; opens nothing. This file is closed
      * first. 0 or the status of the close. */
     int clone(const DataFile* source);
-    /** Writes raster and side file under another name, the side file last. With `overwrite` 0 an existing raster
-     * is kept and 1 returned. 0, 1, 4, 5, 7, 9; a raster that could not be copied whole is removed. */
+    /** Writes raster and side file under another name. Both become new together when all of it is on the disk;
+     * until then, and whenever anything fails, older ones stay as they are. Permissions of older files are kept,
+     * symbolic links to them followed; their side file keeps its other sections. With `overwrite` 0 an existing
+     * raster is kept and 1 returned. 0; 1 also onto itself; 4, 5, 7; 9 also where either file cannot be made. */
     int copy(const char* file_name, int overwrite = 1);
 
     /** Names the raster; a name of 512 bytes or more is refused (1). */
@@ -259,6 +269,15 @@ public:
     /** Opens the raster; READ_WRITE needs it to exist. A file that is open is closed first, and one that cannot be
      * opened leaves it closed. Any other mode opens and closes nothing: a file that is open goes to its start. */
     void open(int mode);
+    /** Starts a new raster of this name, open in mode WRITE: it is written beside an older one, which stays as it
+     * is, its side file too, until commit(). Closed without that, the new one goes. 0; 1 without a name; 7; 9
+     * where the raster or its side file cannot be replaced. */
+    int create();
+    /** The raster that create() started is complete: when all of it is on the disk, it and a side file with its
+     * description take their names, both or neither. Permissions, links and other sections are kept as by copy().
+     * The file is closed in any case. 0; 1 without create() or where the description makes no raster; 5 also where
+     * fewer bytes were written than it needs; the first failure before; 7, 9. */
+    int commit();
     /** Gives the open file a buffer of `size` bytes. A file that is written stays at its place; in mode READ it
      * goes to its start, and `keep` bytes (at most size - 1) of what was passed stay when the buffer slides.
      * Ignored for a closed file, for size < 1 and while an older buffer cannot be written; without memory the
@@ -334,8 +353,7 @@ public:
 
     /** Takes over another file's name and description and opens nothing. This file is closed first. Returns 0. */
     int clone(const BufferFile* source);
-    /** Writes raster and side file under another name, the side file last. With `overwrite` 0 an existing raster
-     * is kept. 0; 1, 4, 5, 9 as DataFile::copy(). */
+    /** Writes raster and side file under another name; 0, 1, 4, 5, 7, 9 as DataFile::copy(). */
     int copy(const char* file_name, int overwrite = 1);
 
 private:
@@ -345,6 +363,7 @@ private:
     T readSample(int type, int line, int sample);
     [[nodiscard]] bool prefixRegion(int first_line, int lines, quo::RasterRegion& region) const;
     [[nodiscard]] int64_t place() const;
+    [[nodiscard]] std::string sideFile() const;
     void moveTo(int64_t target);
     void dropBuffer(int64_t next);
     bool loadWindow(int64_t start);
@@ -359,6 +378,7 @@ private:
     int64_t slideForWriting(const char* src, int64_t n);
 
     char name_[512] = "";
+    std::unique_ptr<quo::AtomicFile> new_raster_;  // from create() on
     std::unique_ptr<quo::RasterStream> stream_;
     std::unique_ptr<char[]> buffer_;
     int mode_ = NOT_OPEN;

@@ -86,4 +86,10 @@ int HeaderSession::commit() noexcept {
     return frame.success();
 }
 
+bool HeaderSession::save(AtomicFile& file) {
+    const bool saved = failed_ == QUO_OK && changed_ && document_->save(file);
+    changed_ = changed_ && !saved;
+    return saved;
+}
+
 }  // namespace quo

@@ -9,6 +9,7 @@
 
 namespace quo {
 
+class AtomicFile;
 class HeaderDocument;
 
 /** Keeps one header file in memory while a whole product is read or written: header objects that are read from or
@@ -27,6 +28,9 @@ public:
      * @return 0; 1 when the file cannot be saved; the status of a write that left the document incomplete, which
      * is then not saved. The old file stays whole. */
     [[nodiscard]] int commit() noexcept;
+    /** Saves what the objects have written into a file that the caller makes new together with another: then there
+     * is nothing left to commit. Reports nothing; where it answers false, errno may tell why. */
+    [[nodiscard]] bool save(AtomicFile& file);
 
     /** The innermost session for a file, or null. */
     static HeaderSession* find(const char* file) noexcept;

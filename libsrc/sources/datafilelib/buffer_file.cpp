@@ -5,6 +5,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
 
 #include "datafilelib/raster_region.h"
 #include "datafilelib/raster_stream.h"
@@ -13,6 +14,7 @@
 #include "quo_base/datafile.h"
 #include "sarutillib/bounded_text.h"
 #include "sarutillib/checked_size.h"
+#include "sarutillib/file_io.h"
 
 namespace {
 
@@ -58,6 +60,7 @@ void BufferFile::setFilename(const char* file_name) {
 }
 void BufferFile::getFilename(char* file_name) const { quo::copy_bounded(file_name, sizeof name_, name_); }
 bool BufferFile::is_open() const { return stream_->is_open(); }
+std::string BufferFile::sideFile() const { return std::string{name_} + std::string{kSideSuffix}; }
 bool BufferFile::exists() const { return quo::raster_exists(name_); }
 
 int BufferFile::readhdr(const char* header_name) {
@@ -69,12 +72,8 @@ int BufferFile::readhdr(const char* header_name) {
     return name.empty() || name_[0] != '\0' ? readSection(header_name) : QUO_REFUSED;
 }
 // Without a name the side file would be some ".hdr" of the working directory.
-int BufferFile::readhdr() {
-    return name_[0] ? readhdr((std::string{name_} + std::string{kSideSuffix}).c_str()) : QUO_REFUSED;
-}
-int BufferFile::writehdr() {
-    return name_[0] ? writehdr((std::string{name_} + std::string{kSideSuffix}).c_str()) : QUO_REFUSED;
-}
+int BufferFile::readhdr() { return name_[0] ? readhdr(sideFile().c_str()) : QUO_REFUSED; }
+int BufferFile::writehdr() { return name_[0] ? writehdr(sideFile().c_str()) : QUO_REFUSED; }
 int BufferFile::writehdr(const char* header_name) {
     const Quiet quiet;
     return writeSection(header_name);
@@ -89,6 +88,43 @@ void BufferFile::open(int mode) {
     constexpr Mode kModes[] = {Mode::kRead, Mode::kCreateAndRead, Mode::kUpdate};
     if (!stream_->open(name_, kModes[mode - READ])) return note(QUO_NOT_OPENED);
     mode_ = mode;
+}
+
+int BufferFile::create() {
+    const Quiet quiet;
+    status_ = error_ = 0;
+    close();
+    if (!name_[0]) return QUO_REFUSED;
+    try {
+        // The side file is written last, perhaps hours from now: that it can be replaced is tried out before.
+        const bool describable = quo::AtomicFile{sideFile().c_str()}.good();
+        auto raster = std::make_unique<quo::AtomicFile>(name_);
+        if (!describable || !raster->good() || !stream_->open_same(raster->descriptor())) {
+            note(QUO_NOT_OPENED);
+        } else {
+            new_raster_ = std::move(raster);
+            mode_ = WRITE;
+        }
+    } catch (const std::bad_alloc&) {
+        note(QUO_NO_MEMORY);
+    }
+    return status_;
+}
+
+int BufferFile::commit() {
+    const Quiet quiet;
+    if (!new_raster_) return QUO_REFUSED;
+    const int64_t size = rasterSize();
+    if (flush() && end().value_or(0) < size) note(QUO_WRITE_FAILED);
+    int status = size < 0 ? QUO_REFUSED : status_;
+    try {
+        if (status == QUO_OK) status = commitPair(*new_raster_, sideFile().c_str());
+    } catch (const std::bad_alloc&) {
+        status = QUO_NO_MEMORY;
+    }
+    note(status);
+    close();
+    return status;
 }
 
 void BufferFile::note(int status) {
@@ -119,6 +155,7 @@ void BufferFile::close() {
     size_ = keep_ = dirty_first_ = dirty_last_ = 0;
     dropBuffer(0);
     if (!stream_->close()) note(QUO_WRITE_FAILED);
+    new_raster_.reset();
     mode_ = NOT_OPEN;
 }
 
@@ -436,6 +473,5 @@ int BufferFile::copy(const char* file_name, int overwrite) {
     BufferFile target{file_name};
     if (!target.name_[0]) return QUO_REFUSED;
     target.copyDescription(*this);
-    if (const int status = quo::copy_raster(name_, target.name_, overwrite != 0)) return status;
-    return target.writehdr();
+    return target.copyPair(name_, target.name_, overwrite != 0);
 }

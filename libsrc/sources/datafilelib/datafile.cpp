@@ -6,6 +6,7 @@
 #include <cstring>
 #include <limits>
 #include <new>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -13,9 +14,12 @@
 #include "datafilelib/raster_stream.h"
 #include "datafilelib/sample_kernels.h"
 #include "diagnosticslib/call_frame.h"
+#include "diagnosticslib/saved_in_place.h"
 #include "quo_base/profile.h"
+#include "quorelxmllib/header_session.h"
 #include "sarutillib/bounded_text.h"
 #include "sarutillib/checked_size.h"
+#include "sarutillib/file_io.h"
 
 namespace {
 
@@ -23,6 +27,7 @@ constexpr const char* kSource = "datafile";
 constexpr const char* kSection = "RasterInfo";
 constexpr const char* kReadFailed = "File reading failed!";
 constexpr const char* kWriteFailed = "File writing failed!";
+constexpr const char* kSideSuffix = ".hdr";
 constexpr int kDescriptionElements = 6;
 
 struct CellName {
@@ -141,6 +146,27 @@ int RasterDescription::writeSection(const char* side_file) {
     return writeAuxiliaryFile(side_file, 1, kSection);
 }
 
+int RasterDescription::commitPair(quo::AtomicFile& raster, const char* side_file) {
+    quo::HeaderSession session{side_file};  // or the section would be saved by itself
+    if (const int status = writeSection(side_file)) return status;
+    quo::AtomicFile side{side_file};
+    if (!side.good()) return QUO_NOT_OPENED;
+    if (!session.save(side) || !quo::commit_pair(raster, side)) return QUO_WRITE_FAILED;
+    for (const quo::AtomicFile* file : {&raster, &side})
+        quo::warn_if_in_place(*file, "RasterDescription::commitPair", kSource);
+    return QUO_OK;
+}
+
+int RasterDescription::copyPair(const char* from, const char* to, bool overwrite) {
+    try {
+        std::optional<quo::AtomicFile> raster;
+        const int status = quo::copy_raster(from, to, overwrite, raster);
+        return status != QUO_OK ? status : commitPair(*raster, (std::string{to} + kSideSuffix).c_str());
+    } catch (const std::bad_alloc&) {
+        return QUO_NO_MEMORY;
+    }
+}
+
 DataFile::DataFile() : stream_{std::make_unique<quo::RasterStream>()} {}
 DataFile::~DataFile() { close(); }
 
@@ -149,7 +175,7 @@ std::string DataFile::path() const {
     const std::size_t length = strnlen(FileName, sizeof FileName);
     return {FileName, length < sizeof FileName ? length : 0};
 }
-std::string DataFile::sideFile() const { return path() + ".hdr"; }
+std::string DataFile::sideFile() const { return path() + kSideSuffix; }
 
 int DataFile::setFilename(const char* file_name) {
     const std::string_view name = quo::text_or_empty(file_name);
@@ -362,10 +388,7 @@ int DataFile::copy(const char* file_name, int overwrite) {
     DataFile target;
     target.clone(this);
     if (target.setFilename(file_name) != QUO_OK) return frame.fail(QUO_REFUSED, "File name too long");
-    if (const int status = quo::copy_raster(path().c_str(), target.FileName, overwrite != 0))
-        return finish(frame, status);
-    if (const int status = target.write_hdr()) return frame.callee(status);
-    return frame.success();
+    return finish(frame, target.copyPair(path().c_str(), target.FileName, overwrite != 0));
 }
 
 // Contents come before the buffer's bookkeeping: pending bytes reach the file before a region is moved, and the

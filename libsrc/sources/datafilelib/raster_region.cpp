@@ -5,9 +5,7 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <cstdio>
 #include <cstring>
-#include <string>
 
 #include "diagnosticslib/call_frame.h"
 #include "sarutillib/checked_size.h"
@@ -107,7 +105,7 @@ private:
     char* to_;
 };
 
-int copy_bytes(const RasterStream& from, const RasterStream& to) {
+int copy_bytes(const RasterStream& from, AtomicFile& to) {
     const auto length = from.length();
     if (!length) return QUO_READ_FAILED;
     TrackedBuffer<char> chunk{static_cast<std::size_t>(kChunk)};
@@ -115,7 +113,7 @@ int copy_bytes(const RasterStream& from, const RasterStream& to) {
     for (std::int64_t done = 0; done < *length; done += kChunk) {
         const auto bytes = static_cast<std::size_t>(std::min(kChunk, *length - done));
         if (from.read_at(done, chunk.data(), bytes).bytes != bytes) return QUO_READ_FAILED;
-        if (to.write_at(done, chunk.data(), bytes).bytes != bytes) return QUO_WRITE_FAILED;
+        if (!to.write({chunk.data(), bytes})) return QUO_WRITE_FAILED;
     }
     return QUO_OK;
 }
@@ -192,19 +190,14 @@ int write_region(const RasterStream& stream, const RasterRegion& region, const R
     return QUO_OK;
 }
 
-int copy_raster(const char* from, const char* to, bool overwrite) {
-    if (same_file(from, to) || (!overwrite && access(to, F_OK) == 0)) return QUO_REFUSED;
-    errno = 0;
-    RasterStream source, target;
+int copy_raster(const char* from, const char* to, bool overwrite, std::optional<AtomicFile>& copy) {
+    const bool refused = same_file(from, to) || (!overwrite && access(to, F_OK) == 0);
+    errno = 0;  // that a file is missing is no failure here
+    if (refused) return QUO_REFUSED;
+    RasterStream source;
     if (!source.open(from, RasterStream::Mode::kRead)) return QUO_NOT_OPENED;
-    // Under another name until it is whole, so that an old raster survives a failure.
-    const std::string unfinished = std::string{to} + ".part";
-    if (!target.open(unfinished.c_str(), RasterStream::Mode::kCreate)) return QUO_NOT_OPENED;
-    int status = copy_bytes(source, target);
-    const bool closed = target.close();
-    if (status == QUO_OK && (!closed || std::rename(unfinished.c_str(), to) != 0)) status = QUO_WRITE_FAILED;
-    if (status != QUO_OK) unlink(unfinished.c_str());
-    return status;
+    copy.emplace(to);
+    return copy->good() ? copy_bytes(source, *copy) : QUO_NOT_OPENED;
 }
 
 }  // namespace quo

@@ -7,6 +7,7 @@
 
 #include "datafilelib/raster_stream.h"
 #include "datafilelib/sample_kernels.h"
+#include "sarutillib/file_io.h"
 
 namespace quo {
 
@@ -48,9 +49,9 @@ int read_region(const RasterStream& stream, const RasterRegion& region, const Re
 int write_region(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout,
                  const char* from);
 
-/** Copies a file's bytes as they are, holes included; a partial copy is removed. 0, 1 when the target exists and
+/** Copies a file's bytes as they are into a new file, which the caller commits. 0, 1 when the target exists and
  * must be kept or is the source itself, 4, 5, 7, 9. */
-int copy_raster(const char* from, const char* to, bool overwrite);
+int copy_raster(const char* from, const char* to, bool overwrite, std::optional<AtomicFile>& copy);
 
 }  // namespace quo
 

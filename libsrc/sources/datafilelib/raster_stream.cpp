@@ -59,6 +59,12 @@ bool RasterStream::open(const char* path, Mode mode) noexcept {
     return true;
 }
 
+bool RasterStream::open_same(int descriptor) noexcept {
+    close();
+    descriptor_ = fcntl(descriptor, F_DUPFD_CLOEXEC, 0);
+    return descriptor_ >= 0;
+}
+
 bool RasterStream::close() noexcept {
     if (descriptor_ < 0) return true;
     const bool closed = ::close(descriptor_) == 0;

@@ -25,6 +25,8 @@ public:
     RasterStream& operator=(const RasterStream&) = delete;
 
     [[nodiscard]] bool open(const char* path, Mode mode) noexcept;
+    /** Reads and writes through another descriptor of a file that somebody else opened for both. */
+    [[nodiscard]] bool open_same(int descriptor) noexcept;
     /** False when what was written could not be handed to the disk. */
     bool close() noexcept;
     [[nodiscard]] bool is_open() const noexcept { return descriptor_ >= 0; }
