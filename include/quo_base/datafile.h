@@ -2,6 +2,7 @@
 #define QUO_BASE_DATAFILE_H
 
 #include <memory>
+#include <optional>
 
 #include "quo_base/api.h"
 #include "quo_base/quorelxml_v2.h"
@@ -35,8 +36,10 @@ enum RasterCellType {
 };
 
 namespace quo {
+class AtomicFile;
 class RasterStream;
 struct RasterRegion;
+struct RegionLayout;
 }  // namespace quo
 
 /** The description that both raster classes hold. Section "RasterInfo" of the side file, six integers. */
@@ -68,6 +71,13 @@ protected:
     int readSection(const char* side_file);
     /** Writes it; 0 or a failing status, 1 also for a HeaderOffset that an integer of the file cannot hold. */
     int writeSection(const char* side_file);
+    /** Makes a new raster and its side file, with this description, the files of their names: both or neither. An
+     * older side file keeps its other sections. 0; 1 as writeSection(); 5, 7; 9 where the side file cannot be
+     * replaced. */
+    int commitPair(quo::AtomicFile& raster, const char* side_file);
+    /** Copies a raster and describes the copy in its side file, as commitPair() does; otherwise as
+     * DataFile::copy(). */
+    int copyPair(const char* from, const char* to, bool overwrite);
 
 private:
     int32_t stored_offset_ = 0;  // HeaderOffset as the side file holds it
@@ -119,19 +129,22 @@ public:
     /** Takes over another file's name and description, buffer size included; opens nothing. This file is closed
      * first. 0 or the status of the close. */
     int clone(const DataFile* source);
-    /** Writes raster and side file under another name, the side file last. With `overwrite` 0 an existing raster
-     * is kept and 1 returned. 0, 1, 4, 5, 7, 9; a raster that could not be copied whole is removed. */
+    /** Writes raster and side file under another name. Both become new together when all of it is on the disk;
+     * until then, and whenever anything fails, older ones stay as they are. Permissions of older files are kept,
+     * symbolic links to them followed; their side file keeps its other sections. With `overwrite` 0 an existing
+     * raster is kept and 1 returned. 0; 1 also onto itself; 4, 5, 7; 9 also where either file cannot be made. */
     int copy(const char* file_name, int overwrite = 1);
 
     /** Names the raster; a name of 512 bytes or more is refused (1). */
     int setFilename(const char* file_name);
 
     char FileName[512] = "";  ///< raster path
-    int32_t BufferSize = 0;   ///< bytes of the buffer; 0: unbuffered
+    int32_t BufferSize = 0;   ///< bytes of the buffer, taken by open(); 0: unbuffered
 
 private:
     friend class BufferIO;
 
+    [[nodiscard]] std::string path() const;
     [[nodiscard]] std::string sideFile() const;
     int refill();
     int flushBuffer();
@@ -141,10 +154,13 @@ private:
     int seekWriting(int64_t offset);
     int seekReading(int64_t offset, int whence);
     int prepareRegion(int64_t next);
+    int read(const quo::RasterRegion& region, const quo::RegionLayout& layout, char* dst, int64_t next);
+    int write(const quo::RasterRegion& region, const quo::RegionLayout& layout, const char* src, int64_t next);
 
     std::unique_ptr<quo::RasterStream> stream_;
     std::unique_ptr<char[]> buffer_;
     int64_t position_ = 0;
+    int32_t buffer_size_ = 0;  // bytes of buffer_, whatever BufferSize says meanwhile
     int32_t cursor_ = 0, fill_ = 0, state_ = 0;
     bool pending_ = false;  // the buffer holds bytes before its cursor that the file does not have yet
 };
@@ -195,9 +211,10 @@ private:
 
 /** A raster file with a sliding buffer and typed block access.
  *
- * Reports nothing: operations return counts or nothing, and requests that cannot be met are ignored. The buffer
- * keeps the target of a seek in its middle (writing) or `keep` bytes after its start (reading), so that small
- * steps back and forth stay in memory; what is read and written is what a plain file would give. */
+ * Reports nothing: operations return counts or nothing, and requests that cannot be met are ignored; what the
+ * system refused is kept by status(). The buffer keeps the target of a seek in its middle (writing) or `keep`
+ * bytes after its start (reading), so that small steps back and forth stay in memory; what is read and written is
+ * what a plain file would give. */
 class QUO_BASE_API BufferFile : public RasterDescription {
 public:
     /** How the file is open. */
@@ -249,17 +266,36 @@ public:
     /** Whether it is open for writing. */
     [[nodiscard]] bool is_writing() const { return mode_ == WRITE || mode_ == READ_WRITE; }
 
-    /** Opens the raster; READ_WRITE needs it to exist. Any other mode, or a file that cannot be opened, leaves it
-     * closed. A file that is open is closed first. */
+    /** Opens the raster; READ_WRITE needs it to exist. A file that is open is closed first, and one that cannot be
+     * opened leaves it closed. Any other mode opens and closes nothing: a file that is open goes to its start. */
     void open(int mode);
-    /** Gives the open file a buffer of `size` bytes and goes to its start; reading, `keep` bytes (at most size -
-     * 1) of what was passed stay when it slides. Ignored for a closed file and for size < 1; without memory the
+    /** Starts a new raster of this name, open in mode WRITE: it is written beside an older one, which stays as it
+     * is, its side file too, until commit(). Closed without that, the new one goes. 0; 1 without a name; 7; 9
+     * where the raster or its side file cannot be replaced. */
+    int create();
+    /** The raster that create() started is complete: when all of it is on the disk, it and a side file with its
+     * description take their names, both or neither. Permissions, links and other sections are kept as by copy().
+     * The file is closed in any case. 0; 1 without create() or where the description makes no raster; 5 also where
+     * fewer bytes were written than it needs; the first failure before; 7, 9. */
+    int commit();
+    /** Gives the open file a buffer of `size` bytes. A file that is written stays at its place; in mode READ it
+     * goes to its start, and `keep` bytes (at most size - 1) of what was passed stay when the buffer slides.
+     * Ignored for a closed file, for size < 1 and while an older buffer cannot be written; without memory the
      * file is unbuffered. */
     void initbuffer(int size, int keep);
-    /** Writes what is pending and closes the file; the buffer is released. */
+    /** Writes what is pending and closes the file; the buffer is released. status() tells afterwards whether
+     * everything has arrived. */
     void close();
-    /** Moves to another place; a place before the start is ignored. Deliberate: an offset of 0 changes nothing,
-     * whatever the type. */
+    /** What became of everything asked for since open(), the closing of the file before included: 0, or the
+     * status of the first failure, which stays until the next open(). 4 where the system refused to read (the end
+     * of the file is no failure, unless a block or a single sample lies beyond it); 5 where bytes could not be
+     * written: at once, or later what a buffer held, by seek(), close() or any other call; 7 without memory; 9
+     * where the file could not be opened. Requests that are ignored leave it alone. */
+    [[nodiscard]] int status() const { return status_; }
+    /** The system's error number that came with status(); 0 where it gave none. */
+    [[nodiscard]] int systemError() const { return error_; }
+    /** Moves to another place; a place before the start is ignored. An offset of 0 changes nothing, whatever the
+     * type. What a buffer held and could not be written is given up when the place leaves the buffer. */
     void seek(int64_t offset, int type);
     /** The place of the next byte; deliberate: with a buffer in mode READ_WRITE, the place of the buffer's start.
      */
@@ -317,8 +353,7 @@ public:
 
     /** Takes over another file's name and description and opens nothing. This file is closed first. Returns 0. */
     int clone(const BufferFile* source);
-    /** Writes raster and side file under another name, the side file last. With `overwrite` 0 an existing raster
-     * is kept. 0; 1, 4, 5, 9 as DataFile::copy(). */
+    /** Writes raster and side file under another name; 0, 1, 4, 5, 7, 9 as DataFile::copy(). */
     int copy(const char* file_name, int overwrite = 1);
 
 private:
@@ -328,19 +363,28 @@ private:
     T readSample(int type, int line, int sample);
     [[nodiscard]] bool prefixRegion(int first_line, int lines, quo::RasterRegion& region) const;
     [[nodiscard]] int64_t place() const;
+    [[nodiscard]] std::string sideFile() const;
     void moveTo(int64_t target);
     void dropBuffer(int64_t next);
-    void loadWindow(int64_t start);
+    bool loadWindow(int64_t start);
+    void note(int status);
     bool flush();
+    [[nodiscard]] std::optional<int64_t> end();
+    bool hasWindow();
     void markWritten(int64_t first, int64_t last);
     bool advanceForReading();
+    int64_t readDirectly(char* to, int64_t n);
+    int64_t writeDirectly(const char* src, int64_t n);
     int64_t slideForWriting(const char* src, int64_t n);
 
     char name_[512] = "";
+    std::unique_ptr<quo::AtomicFile> new_raster_;  // from create() on
     std::unique_ptr<quo::RasterStream> stream_;
     std::unique_ptr<char[]> buffer_;
     int mode_ = NOT_OPEN;
-    int64_t start_ = 0;  // file offset of the buffer's first byte; unbuffered, the current place
+    int status_ = 0, error_ = 0;  // of the first failure since open()
+    bool loaded_ = false;         // the buffer holds what the file has there; else only the place counts
+    int64_t start_ = 0;           // file offset of the buffer's first byte; unbuffered, the current place
     int64_t size_ = 0, keep_ = 0, cursor_ = 0, fill_ = 0;
     int64_t dirty_first_ = 0, dirty_last_ = 0;  // bytes of the buffer that the file does not have yet
 };

@@ -1,4 +1,5 @@
 #include <gtest/gtest.h>
+#include <sys/mman.h>
 
 #include <algorithm>
 #include <cerrno>
@@ -14,6 +15,8 @@
 #include "support/raster.h"
 
 namespace {
+
+constexpr int kLineSamples = 5;  // of INT16
 
 /** A plain file in memory. */
 struct PlainFile {
@@ -40,6 +43,20 @@ struct PlainFile {
     }
 };
 
+void write_lines(BufferFile& file, PlainFile& plain, int line, int lines, short value) {
+    const std::vector<short> block(static_cast<std::size_t>(lines * kLineSamples), value);
+    file.writebuffer(block.data(), line, lines, 0, 0);
+    plain.place = std::int64_t{line} * kLineSamples * 2;
+    plain.write({reinterpret_cast<const char*>(block.data()), 2 * block.size()});
+}
+void read_lines(BufferFile& file, PlainFile& plain, int line, int lines) {
+    std::vector<short> block(static_cast<std::size_t>(lines * kLineSamples));
+    file.readbuffer(block.data(), line, lines, 0, 0);
+    plain.place = std::int64_t{line} * kLineSamples * 2;
+    EXPECT_EQ((std::string{reinterpret_cast<const char*>(block.data()), 2 * block.size()}),
+              plain.read(2 * lines * kLineSamples));
+}
+
 struct Walk {
     int mode, size, keep;
 };
@@ -57,7 +74,8 @@ std::vector<Walk> walks() {
 class RandomWalk : public testing::TestWithParam<Walk> {};
 
 // Long sequences of requests against a plain file: what is read, what is written, where it goes on, and in the end
-// the bytes on the disk.
+// the bytes on the disk. Once, a new buffer went to the start of a file that was written, and after a block bytes
+// that were written apart took zeros between them to the disk.
 TEST_P(RandomWalk, SeesWhatAPlainFileGives) {
     const Walk& walk = GetParam();
     const test::TemporaryFolder folder;
@@ -76,15 +94,24 @@ TEST_P(RandomWalk, SeesWhatAPlainFileGives) {
         if (walk.mode == 2) plain.bytes.clear();
         file.initbuffer(walk.size, walk.keep);
         EXPECT_EQ(file.is_buffered(), walk.size > 0);
+        file.NrOfPixelsPerLine = kLineSamples;
+        file.CellType = INT16;
         for (int step = 0; step < 400; ++step) {
             const int n = random(0, 9) == 0 ? random(0, 150) : random(0, 12);
-            const int what = random(0, 9);
-            if (what < 4) {
+            const int what = random(0, 39);
+            if (what == 39) {
+                file.initbuffer(walk.size, walk.keep);
+                if (walk.mode == 1 && walk.size > 0) plain.place = 0;
+            } else if (what == 38 && walk.mode != 1) {
+                write_lines(file, plain, random(0, 20), random(1, 3), static_cast<short>(random(1, 9999)));
+            } else if (what == 37 && walk.mode != 2) {
+                read_lines(file, plain, random(0, 17), random(1, 3));
+            } else if (what < 15) {
                 std::string got(static_cast<std::size_t>(n), '?');
                 const int moved = file.read(got.data(), n);
                 got.resize(static_cast<std::size_t>(moved));
                 ASSERT_EQ(got, walk.mode == 2 ? "" : plain.read(n)) << "round " << round << " step " << step;
-            } else if (what < 7) {
+            } else if (what < 26) {
                 std::string piece;
                 for (int i = 0; i < n; ++i) piece += static_cast<char>(random(1, 255));
                 const int moved = file.write(piece.data(), n);
@@ -101,6 +128,7 @@ TEST_P(RandomWalk, SeesWhatAPlainFileGives) {
             }
         }
         file.close();
+        ASSERT_EQ(file.status(), 0);
         ASSERT_TRUE(test::read_text(name) == plain.bytes) << "round " << round;
     }
     EXPECT_EQ(errno, 0);
@@ -116,8 +144,10 @@ protected:
         for (int i = 0; i < 100; ++i) content_ += static_cast<char>(i);
         test::write_text(name_, content_);
     }
-    test::TemporaryFolder folder_;
-    std::string name_ = folder_.file("bytes.raw"), content_;
+    void TearDown() override { EXPECT_TRUE(report_.entries().empty()) << "nothing is reported"; }
+
+    test::Report report_;
+    std::string name_ = report_.file("bytes.raw"), content_;
     BufferFile file_{name_.c_str()};
 };
 
@@ -152,10 +182,20 @@ TEST_F(BufferFileBytes, IgnoresWhatItCannotDo) {
     file_.initbuffer(0, 0);
     file_.initbuffer(-5, 0);
     EXPECT_FALSE(file_.is_buffered());
-    file_.setFilename(folder_.path().c_str());
+    // An unknown mode once closed the file.
+    EXPECT_EQ(file_.read(bytes, 4), 4);
+    file_.open(9);
+    EXPECT_EQ(file_.tell(), 0);
+    EXPECT_EQ(file_.read(bytes, 4), 4);
+    EXPECT_EQ(std::string(bytes, 4), content_.substr(0, 4));
+    EXPECT_EQ(file_.status(), 0);
+    file_.setFilename(report_.folder().path().c_str());
     file_.open(1);
     EXPECT_FALSE(file_.is_open()) << "a folder";
     EXPECT_FALSE(file_.exists());
+    // Side files that cannot be read or written once came up in the report.
+    file_.setFilename(report_.file("no/raster").c_str());
+    EXPECT_EQ(file_.writehdr() + file_.readhdr(), 2);
     EXPECT_EQ(errno, 0);
     EXPECT_EQ(test::read_text(name_), content_);
 }
@@ -184,6 +224,123 @@ TEST_F(BufferFileBytes, AFullDiskMovesLess) {
         file_.close();
         EXPECT_EQ(test::read_text(name_), letters);
         EXPECT_EQ(errno, 0);
+    }
+}
+
+// Calls that the system lets down, in mode READ_WRITE with three bytes pending in a buffer of 16: they stay
+// pending, or are given up where the place leaves the buffer, and the status says so until the next open(). Once
+// nobody could tell, and a read that could not write them first slid the buffer away beneath them.
+TEST_F(BufferFileBytes, WhatTheSystemRefusesIsTold) {
+    file_.NrOfPixelsPerLine = kLineSamples;
+    file_.CellType = INT16;
+    const struct {
+        const char* name;
+        int status, error;  // 5: while the disk is full
+        const char* start;  // of the file in the end
+        void (*call)(BufferFile&);
+    } rows[] = {
+        {"seek", 5, EFBIG, "\0\1\2", [](BufferFile& f) { f.seek(80, 0); }},
+        {"close", 5, EFBIG, "\0\1\2", [](BufferFile& f) { f.close(); }},
+        {"open", 5, EFBIG, "\0\1\2", [](BufferFile& f) { f.open(1); }},
+        {"initbuffer", 5, EFBIG, "abc", [](BufferFile& f) { f.initbuffer(8, 0); }},
+        {"copy", 5, EFBIG, "abc", [](BufferFile& f) { EXPECT_EQ(f.copy("/no/copy"), 5); }},
+        {"read", 5, EFBIG, "abc",
+         [](BufferFile& f) {
+             char to[40];
+             EXPECT_EQ(f.read(to, 40), 13);
+         }},
+        {"write", 5, EFBIG, "abc", [](BufferFile& f) { EXPECT_EQ(f.write("0123456789ABCDEF", 16), 0); }},
+        {"block", 5, EFBIG, "abc", [](BufferFile& f) { f.readbuffer(std::vector<short>(5).data(), 0, 1, 0, 5); }},
+        {"block beyond", 4, 0, "abc",
+         [](BufferFile& f) { f.readbuffer(std::vector<short>(5).data(), 10, 1, 0, 0); }},
+        {"sample beyond", 4, 0, "abc", [](BufferFile& f) { EXPECT_EQ(f.readShort(10, 0), 0); }},
+        {"missing", 9, ENOENT, "abc",
+         [](BufferFile& f) {
+             f.setFilename("/no/raster");
+             f.open(3);
+         }},
+    };
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.name);
+        test::write_text(name_, content_);
+        file_.setFilename(name_.c_str());
+        file_.open(3);
+        EXPECT_EQ(file_.status() + file_.systemError(), 0);
+        file_.initbuffer(16, 0);
+        ASSERT_EQ(file_.write("abc", 3), 3);
+        {
+            std::optional<test::FullDisk> full;
+            if (row.status == 5) full.emplace(0);
+            row.call(file_);
+        }
+        file_.close();
+        EXPECT_EQ(file_.status(), row.status);
+        EXPECT_EQ(file_.systemError(), row.error);
+        EXPECT_EQ(test::read_text(name_).substr(0, 3), std::string(row.start, 3));
+    }
+}
+
+/** Pages of this process's memory, which /proc/self/mem shows as a file. */
+class Pages {
+public:
+    explicit Pages(std::size_t pages)
+        : bytes_{pages * kPage},
+          first_{static_cast<char*>(mmap(nullptr, bytes_, kRights, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0))} {
+        std::fill_n(first_, bytes_, 'v');
+    }
+    ~Pages() { munmap(first_, bytes_); }
+    Pages(const Pages&) = delete;
+    Pages& operator=(const Pages&) = delete;
+
+    [[nodiscard]] char* at(std::size_t offset) const { return first_ + offset; }
+    [[nodiscard]] int64_t place(std::size_t offset) const {
+        return static_cast<int64_t>(reinterpret_cast<std::uintptr_t>(at(offset)));
+    }
+    void lose(std::size_t page) const { munmap(at(page * kPage), kPage); }
+    void find_again(std::size_t page) const {
+        mmap(at(page * kPage), kPage, kRights, MAP_PRIVATE | MAP_ANONYMOUS | MAP_FIXED, -1, 0);
+        std::fill_n(at(page * kPage), kPage, 'v');
+    }
+
+    static constexpr std::size_t kPage = 4096;
+
+private:
+    static constexpr int kRights = PROT_READ | PROT_WRITE;
+    std::size_t bytes_;
+    char* first_;
+};
+
+// A page that cannot be read for a while: once, zeros filled the buffer from there on, and whatever lay between
+// two changes of it was later written over valid samples.
+TEST_F(BufferFileBytes, AnErrorIsNotTheEndOfTheFile) {
+    constexpr std::size_t kPage = Pages::kPage;
+    const Pages pages{3};
+    file_.setFilename("/proc/self/mem");
+    for (const bool moved : {true, false}) {  // into the lost page, or read up to it
+        SCOPED_TRACE(moved);
+        pages.lose(1);
+        file_.open(3);
+        if (!moved) file_.seek(pages.place(kPage - 100), 0);
+        file_.initbuffer(64, 0);
+        std::string got(200, '?');
+        if (moved) {
+            file_.seek(pages.place(kPage + 40), 0);
+        } else {
+            EXPECT_EQ(file_.read(got.data(), 200), 100);
+            EXPECT_EQ(got, std::string(100, 'v') + std::string(100, '?')) << "what can be read arrives";
+        }
+        EXPECT_EQ(file_.status(), 4);
+        EXPECT_EQ(file_.systemError(), EIO);
+        pages.find_again(1);
+        for (int i = 0; i < 3; ++i) {
+            ASSERT_EQ(file_.write("w", 1), 1);
+            file_.seek(10, 1);
+        }
+        file_.close();
+        std::string expected(kPage, 'v');
+        for (int i = 0; i < 3; ++i) expected[static_cast<std::size_t>((moved ? 40 : 0) + 11 * i)] = 'w';
+        EXPECT_TRUE(std::string(pages.at(kPage), kPage) == expected);
+        EXPECT_TRUE(std::string(pages.at(2 * kPage), kPage) == std::string(kPage, 'v'));
     }
 }
 

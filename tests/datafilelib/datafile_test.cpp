@@ -8,7 +8,9 @@
 #include <climits>
 #include <cstring>
 #include <filesystem>
+#include <functional>
 #include <limits>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -203,7 +205,8 @@ const Sequence kSequences[] = {
 };
 
 // The contents are those of a plain file. Once, in mode 3, bytes that were only read were written back where the
-// buffer ended, and pending ones were lost to the next read.
+// buffer ended, and pending ones were lost to the next read; and a size raised by hand while the file was open ran
+// over the end of the buffer.
 TEST_F(DataFileBytes, AreMovedAsInAPlainFile) {
     const test::CapturedStderr silent;
     for (const Sequence& sequence : kSequences) {
@@ -213,6 +216,7 @@ TEST_F(DataFileBytes, AreMovedAsInAPlainFile) {
             std::string plain = sequence.mode == 1 ? "" : content_;
             open(sequence.mode, buffer);
             EXPECT_EQ(file_.is_buffered(), buffer > 0 ? 1 : 0);
+            file_.BufferSize = 9 * buffer;
             EXPECT_EQ(file_.is_writing(), sequence.mode == 3 ? 2 : sequence.mode > 0 ? 1 : 0);
             for (const Step& step : sequence.steps) {
                 const auto n = static_cast<std::size_t>(step.n), before = static_cast<std::size_t>(file_.tell());
@@ -286,10 +290,35 @@ TEST_F(DataFileBytes, WhatCannotBeOpenedGivesNine) {
     file_.setFilename(report_.folder().path().c_str());
     EXPECT_EQ(file_.open(0), 9) << "a folder is no raster";
     EXPECT_EQ(file_.exists(), 0);
+    std::fill(std::begin(file_.FileName), std::end(file_.FileName), 'n');  // by hand, without an end
+    EXPECT_EQ(file_.open(0), 9);
+    EXPECT_EQ(file_.exists(), 0);
     for (const std::string& message : report_.messages("ERROR")) {
         EXPECT_THAT(message, testing::AnyOf("File not opened!", std::string{std::strerror(ENOENT)},
                                             std::string{std::strerror(EISDIR)}));
     }
+}
+
+// The entry names the call that failed, and the line of it that did; who called it stands in the call tree. Once
+// all of them bore the name of the region's function and one helper's line.
+TEST_F(DataFileBytes, FailuresOfRegionsNameTheCallAndItsLine) {
+    const test::CapturedStderr silent;
+    char bytes[120] = {};
+    describe(file_, 9, 3, INT16, 0, 2, 0);
+    BufferIO region{&file_, 0, 3, 0, 9, INT16}, outside{&file_, 1, 3, 0, 9, INT16};
+    open(0, 0);
+    EXPECT_EQ(region.readbuffer(bytes, 3) + region.readprefix(bytes), 4 + 4);
+    EXPECT_EQ(outside.readbuffer(bytes, 3) + outside.writebuffer(bytes), 1 + 1);
+    std::vector<std::string> places;
+    std::set<int> lines;
+    for (const test::ReportEntry& entry : report_.entries()) {
+        places.push_back(entry.kind + " " + entry.function);
+        lines.insert(entry.line);
+    }
+    EXPECT_THAT(places, testing::ElementsAre("ERROR DataFile::read", "ERROR_CALL_TREE BufferIO::readbuffer",
+                                             "ERROR DataFile::read", "ERROR_CALL_TREE BufferIO::readprefix",
+                                             "ERROR BufferIO::readbuffer", "ERROR BufferIO::writebuffer"));
+    EXPECT_EQ(lines.size(), 5U);
 }
 
 // A write that is cut short says so in every way to write, and once there is room again nothing is missing.
@@ -333,34 +362,92 @@ TEST_F(DataFileBytes, AFullDiskGivesFiveAndLosesNothing) {
     EXPECT_THAT(report_.messages("ERROR"), testing::Contains("File writing failed!"));
 }
 
-TEST_F(DataFileBytes, CopiesAreWholeOrNotThere) {
+// Raster and side file in three ways. Once they were written through names that could be foretold, over another's
+// file of that name; a mode of 0600 became 0644, a link a file; and a side file that failed left the new raster
+// beside the old description.
+TEST_F(DataFileBytes, PairsAreReplacedWholeOrNotAtAll) {
     const test::CapturedStderr silent;
     describe(file_, 4, 15, INT8, 0, 0, 0);
     BufferFile buffer{name_.c_str()};
     buffer.copyDescription(file_);
-    const auto check = [&](auto copy, const std::string& other) {
+    const std::function<int(const std::string&)> writers[] = {
+        [&](const std::string& to) { return file_.copy(to.c_str()); },
+        [&](const std::string& to) { return buffer.copy(to.c_str()); },
+        [&](const std::string& to) {
+            BufferFile made{to.c_str()};
+            made.copyDescription(file_);
+            const int status = made.create();
+            made.initbuffer(16, 0);
+            made.write(content_.data(), 60);
+            return status != 0 ? status : made.commit();
+        },
+    };
+    for (const auto& write : writers) {
+        SCOPED_TRACE(&write - writers);
+        const std::string folder = report_.file(std::to_string(&write - writers)), link = folder + "/link",
+                          other = folder + "/x", side = other + ".hdr", linked_side = link + ".hdr";
+        std::filesystem::create_directory(folder);
+        EXPECT_EQ(write(folder + "/no/copy.raw"), 9);
         test::write_text(other, "older");
-        EXPECT_EQ(copy(other, 0), 1) << "not to be overwritten";
-        EXPECT_EQ(copy(name_, 1), 1) << "onto itself";
-        EXPECT_EQ(copy(report_.file("no/copy.raw"), 1), 9);
-        {
-            const test::FullDisk full{37};
-            EXPECT_EQ(copy(other, 1), 5);
+        std::filesystem::create_directory(linked_side);
+        std::filesystem::create_symlink("x", link);
+        EXPECT_EQ(write(link), 9) << "a side file that cannot be replaced";
+        std::filesystem::remove(linked_side);
+        std::filesystem::create_symlink("x.hdr", linked_side);
+        DataFile older;
+        older.setFilename(other.c_str());
+        ASSERT_EQ(older.write_hdr(), 0);
+        const std::string described = test::read_text(side);
+        chmod(other.c_str(), 0600);
+        chmod(side.c_str(), 0640);
+        int status = 5;
+        for (rlim_t room = 0; status != 0; room += 30) {
+            ASSERT_EQ(status, 5) << room;
+            EXPECT_EQ(test::read_text(other), "older");
+            EXPECT_EQ(test::read_text(side), described);
+            const test::FullDisk full{room};
+            status = write(link);
         }
-        EXPECT_EQ(test::read_text(other), "older");
-        EXPECT_FALSE(std::filesystem::exists(other + ".hdr"));
-        ASSERT_EQ(copy(other, 1), 0);
         EXPECT_EQ(test::read_text(other), content_);
         DataFile read;
-        EXPECT_EQ(read.read_hdr(other.c_str()), 0);
+        EXPECT_EQ(read.read_hdr(link.c_str()), 0);
         EXPECT_EQ(values_of(read), values_of(file_));
-    };
-    check([&](const std::string& to, int over) { return file_.copy(to.c_str(), over); }, report_.file("a.raw"));
-    check([&](const std::string& to, int over) { return buffer.copy(to.c_str(), over); }, report_.file("b.raw"));
+        struct stat found {};
+        EXPECT_TRUE(lstat(link.c_str(), &found) == 0 && S_ISLNK(found.st_mode));
+        EXPECT_TRUE(stat(other.c_str(), &found) == 0 && (found.st_mode & 0777U) == 0600U);
+        EXPECT_TRUE(stat(side.c_str(), &found) == 0 && (found.st_mode & 0777U) == 0640U);
+        const auto files = std::filesystem::directory_iterator{folder};
+        EXPECT_EQ(std::distance(begin(files), end(files)), 4) << "the pair and the links to it";
+    }
+    const std::string other = report_.file("0/x");
+    EXPECT_EQ(file_.copy(other.c_str(), 0) + buffer.copy(other.c_str(), 0), 2) << "not to be overwritten";
+    EXPECT_EQ(file_.copy(name_.c_str()) + buffer.copy(name_.c_str()), 2) << "onto itself";
+    EXPECT_EQ(test::read_text(name_), content_);
+}
+
+// Until it is complete and committed, a new raster leaves an older one alone.
+TEST_F(DataFileBytes, ANewRasterThatIsNotCompleteGoes) {
+    BufferFile made{name_.c_str()};
+    describe(made, 4, 15, INT16, 0, 0, 0);
+    EXPECT_EQ(made.commit(), 1) << "nothing is begun";
+    for (const bool commits : {false, true}) {
+        ASSERT_EQ(made.create(), 0);
+        EXPECT_EQ(made.write(content_.data(), 60), 60);
+        if (commits) {
+            EXPECT_EQ(made.commit(), 5) << "60 bytes of 120";
+        } else {
+            made.close();
+        }
+        EXPECT_FALSE(made.is_open());
+    }
+    ASSERT_EQ(made.create(), 0);
+    made.NrOfLinesPerImage = -1;
+    EXPECT_EQ(made.commit(), 1);
+    made.setFilename("");
+    EXPECT_EQ(made.create(), 1);
     EXPECT_EQ(test::read_text(name_), content_);
     const auto files = std::filesystem::directory_iterator{report_.folder().path()};
-    EXPECT_EQ(std::distance(begin(files), end(files)), 6)
-        << "two copies, their side files, the raster, the report";
+    EXPECT_EQ(std::distance(begin(files), end(files)), 2) << "the raster and the report";
 }
 
 struct Hostile {

@@ -93,7 +93,13 @@ TEST_F(RasterVerbs, RefusalsNameFileAndCauseAndLeaveNothing) {
         {"BadLines", {"convert", in, "OUT", "--lines", "3:9"}, 2, "no part of 0:4"},
         {"BadType", {"convert", in, "OUT", "--type", "INT99"}, 2, "INT99"},
         {"FolderAsTarget", {"convert", in, folder_.path().string()}, 1, "no regular file"},
-        {"NoSuchFolder", {"convert", in, file("no/out.raw")}, 1, "cannot be created"},
+        {"NoSuchFolder",
+         {"convert", in, file("no/out.raw")},
+         1,
+         "cannot be created with its side file: No such file"},
+        {"StandardOutput", {"convert", in, "-"}, 2, "needs a side file"},
+        {"NoScale", {"convert", in, "OUT", "--scale", "0"}, 2, "--scale 0"},
+        {"NoOffset", {"convert", in, "OUT", "--offset", "nan"}, 2, "--offset nan: no finite number"},
         {"Looks", {"quicklook", in, "OUT", "--looks", "0x3"}, 2, "--looks"},
         {"Decibels", {"quicklook", in, "OUT", "--db", "5:1"}, 2, "--db"},
         {"VrtOfNothing", {"vrt", file("none.raw")}, 1, "none.raw"},
@@ -112,28 +118,91 @@ TEST_F(RasterVerbs, RefusalsNameFileAndCauseAndLeaveNothing) {
     }
 }
 
-TEST_F(RasterVerbs, ConvertRoundsAndHoldsTheBoundsOfNarrowTypes) {
-    std::string bytes;
-    for (const float value : {2.5F, -2.5F, 126.6F, 300.0F, -1e9F, std::nanf("")}) {
-        test::append_bytes(bytes, value, false);
+struct Narrowing {
+    int from;
+    std::vector<std::string> options;
+    std::string expected;  // INT8, or pairs of it
+    const char* said;      // after the name
+};
+// What does not fit is held at the bounds, what is no number becomes 0: once, without a word.
+TEST_F(RasterVerbs, ConvertTellsWhatNarrowTypesCannotHold) {
+    const std::vector<double> values = {2.5, -2.5, 127.4, 127.5, -128.4, -1e9, std::nan(""), INFINITY};
+    const Narrowing rows[] = {
+        {FLOAT32,
+         {"--type", "INT8"},
+         {3, -3, 127, 127, -128, -128, 0, 127},
+         ": clipped to the bounds of INT8: 3 of 8 samples\n: no number, written as 0: 1 of 8 samples\n"},
+        {FLOAT64,
+         {"--type", "INT8", "--scale", "0.5", "--offset", "-64"},
+         {-63, -65, 0, 0, -128, -128, 0, 127},  // -62.75, -65.25, -0.3, -0.25, -128.2
+         ": clipped to the bounds of INT8: 2 of 8 samples\n: no number, written as 0: 1 of 8 samples\n"},
+        {FLOAT_COMPLEX,  // 2.5 - 2.5i, 127.4 + 127.5i, -128.4 - 1e9i, nan + inf i
+         {"--type", "INT8_COMPLEX"},
+         {3, -3, 127, 127, -128, -128, 0, 127},
+         ": clipped to the bounds of INT8_COMPLEX: 2 of 4 samples\n: no number, written as 0: 1 of 4 samples\n"},
+        {DOUBLE_COMPLEX,  // the offset moves the real part
+         {"--type", "INT8_COMPLEX", "--offset", "1", "--samples", ":2"},
+         {4, -3, 127, 127},  // 3.5 - 2.5i, 128.4 + 127.5i
+         ": clipped to the bounds of INT8_COMPLEX: 1 of 2 samples\n"},
+        {FLOAT32, {"--type", "INT8", "--samples", ":3"}, {3, -3, 127}, ""},
+    };
+    for (const Narrowing& row : rows) {
+        SCOPED_TRACE(testing::PrintToString(row.options));
+        std::string bytes;
+        for (const double value : values) test::append_part(bytes, row.from, value, false);
+        const int samples = row.from % 2 == 0 ? 4 : 8;
+        const std::string in = make("in.raw", 1, samples, row.from, 0), out = file("out.raw");
+        test::write_text(in, bytes);
+        std::vector<std::string> arguments{"convert", in, out};
+        arguments.insert(arguments.end(), row.options.begin(), row.options.end());
+        test::Finished finished = test::quo(arguments);
+        ASSERT_EQ(finished.exit_status, 0) << finished.err;
+        EXPECT_EQ(test::read_text(out), row.expected);
+        const std::string name = "quo: " + out;
+        for (auto at = finished.err.find(name); at != std::string::npos; at = finished.err.find(name))
+            finished.err.erase(at, name.size());
+        EXPECT_EQ(finished.err, row.said);
     }
-    const std::string in = make("in.raw", 1, 6, FLOAT32, 0), out = file("out.raw");
-    test::write_text(in, bytes);
-    ASSERT_EQ(test::quo({"convert", in, out, "--type", "INT8"}).exit_status, 0);
-    EXPECT_EQ(test::read_text(out), (std::string{3, -3, 127, 127, -128, 0}));
 }
 
-// What the side file of a raster says besides its layout outlives a conversion of the raster onto itself.
+// 1 + 2^-30 times 2^30, less 2^30: the scaling is done in double precision, also where both types are narrower.
+TEST_F(RasterVerbs, ConvertScalesInDoublePrecision) {
+    for (const int to : {FLOAT32, FLOAT_COMPLEX}) {
+        SCOPED_TRACE(to);
+        std::string bytes, expected;
+        test::append_part(bytes, FLOAT64, 1.0 + 0x1p-30, false);
+        test::append_part(expected, to, 1.0, false);
+        if (to == FLOAT_COMPLEX) test::append_part(expected, to, 0.0, false);
+        const std::string in = make("in.raw", 1, 1, FLOAT64, 0), out = file("out.raw");
+        test::write_text(in, bytes);
+        const test::Finished finished =
+            test::quo({"convert", in, out, "--type", to == FLOAT32 ? "FLOAT32" : "FLOAT_COMPLEX", "--scale",
+                       "1073741824", "--offset", "-1073741824"});
+        ASSERT_EQ(finished.exit_status, 0) << finished.err;
+        EXPECT_EQ(test::read_text(out), expected);
+    }
+}
+
+// What the side file of a raster says besides its layout outlives a conversion of the raster onto itself; so do
+// its permissions and the links that lead to it. Once, 0600 became 0644.
 TEST_F(RasterVerbs, ConvertInPlaceKeepsTheHeader) {
     const std::string in = make("in.raw", 3, 4, INT16, 0);
     ASSERT_EQ(test::quo({"set", in + ".hdr", "Other/note", "kept", "--create"}).exit_status, 0);
-    ASSERT_EQ(test::quo({"convert", in, in, "--order", "m"}).exit_status, 0);
+    for (const char* ending : {"", ".hdr"}) {
+        std::filesystem::permissions(in + ending, std::filesystem::perms{0600});
+        std::filesystem::create_symlink(std::string{"in.raw"} + ending, file("link") + ending);
+    }
+    ASSERT_EQ(test::quo({"convert", in, file("link"), "--order", "m"}).exit_status, 0);
+    for (const char* ending : {"", ".hdr"}) {
+        EXPECT_TRUE(std::filesystem::is_symlink(file("link") + ending));
+        EXPECT_EQ(std::filesystem::status(in + ending).permissions(), std::filesystem::perms{0600});
+    }
     EXPECT_EQ(test::quo({"get", in + ".hdr", "Other/note"}).out, "kept\n");
     EXPECT_EQ(test::quo({"get", in + ".hdr", "RasterInfo/ByteOrder"}).out, "1\n");
     std::string expected;
     for (int i = 0; i < 12; ++i) test::append_part(expected, INT16, test::part_value(i / 4, i % 4, 0), true);
     EXPECT_TRUE(test::read_text(in) == expected);
-    EXPECT_EQ(files(), (std::set<std::string>{"in.raw", "in.raw.hdr"}));
+    EXPECT_EQ(files(), (std::set<std::string>{"in.raw", "in.raw.hdr", "link", "link.hdr"}));
 }
 
 /** A grey picture as its file shows it. */
@@ -189,6 +258,19 @@ TEST_F(RasterVerbs, QuicklookShowsThePowerInDecibels) {
     EXPECT_THAT(grey("1x1"), testing::ElementsAre(100, 100, 200, 170, 0, 0, 255, 0));
     EXPECT_THAT(grey("1x2"), testing::ElementsAre(100, 190, 0, 255));  // 10 log10(6250) = 37.96
     EXPECT_THAT(grey("2x2"), testing::ElementsAre(85, 255));           // 10 log10(201 / 4) = 17.01
+}
+
+// Black for want of numbers is not black for want of power.
+TEST_F(RasterVerbs, QuicklookOfNoNumbersSaysSo) {
+    const std::string in = make("in.raw", 3, 4, FLOAT32, 0);
+    for (const float value : {std::nanf(""), 0.0F}) {
+        std::string bytes;
+        for (int i = 0; i < 12; ++i) test::append_bytes(bytes, value, false);
+        test::write_text(in, bytes);
+        const test::Finished finished = test::quo({"quicklook", in, file("picture.png")});
+        EXPECT_EQ(finished.exit_status, 0);
+        EXPECT_EQ(finished.messages().size(), value == 0.0F ? 0U : 1U);
+    }
 }
 
 // GDAL is the judge of the virtual rasters: it must see the very samples. It has no type of signed bytes

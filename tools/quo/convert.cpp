@@ -1,11 +1,13 @@
 #include <algorithm>
 #include <complex>
 #include <memory>
+#include <type_traits>
 #include <vector>
 
 #include "commands.h"
 #include "failure.h"
 #include "interrupt.h"
+#include "number.h"
 #include "progress.h"
 #include "raster.h"
 
@@ -13,7 +15,7 @@ namespace tool {
 namespace {
 
 struct ConvertOptions {
-    std::string in, out, type, order, lines = ":", samples = ":", prefix = "keep";
+    std::string in, out, type, order, lines = ":", samples = ":", prefix = "keep", scale = "1", offset = "0";
     bool waitbar = false;
 };
 
@@ -34,6 +36,31 @@ public:
     }
 };
 
+/** What becomes of each value: scale x value + offset. Of complex values both parts are scaled, and the real one
+ * is moved. */
+class Scaling {
+public:
+    explicit Scaling(const ConvertOptions& options)
+        : scale_{number_of("--scale", options.scale)}, offset_{number_of("--offset", options.offset)} {
+        if (scale_ == 0.0) throw WrongUse("--scale 0: would leave nothing of the samples");
+    }
+
+    [[nodiscard]] bool changes() const { return scale_ != 1.0 || offset_ != 0.0; }
+    template <typename T>
+    void apply(std::vector<T>& values) const {
+        for (T& value : values) value = value * scale_ + offset_;
+    }
+
+private:
+    static double number_of(const char* option, const std::string& text) {
+        const auto number = finite_number(text);
+        if (!number) throw WrongUse(std::string{option} + " " + text + ": no finite number");
+        return *number;
+    }
+
+    double scale_, offset_;
+};
+
 /** The part of a raster that is copied, tile by tile. */
 class Conversion {
 public:
@@ -41,10 +68,19 @@ public:
         : lines_{cut_of(options.lines, description.NrOfLinesPerImage, "--lines")},
           samples_{cut_of(options.samples, description.NrOfPixelsPerLine, "--samples")},
           wanted_{options, description, lines_, samples_},
+          scaling_{options},
           in_{options.in, description},
           out_{options.out, wanted_} {}
 
     void run(bool waitbar) {
+        copy_all(waitbar);
+        throw_if_interrupted();
+        out_.commit();
+        out_.say_losses();
+    }
+
+private:
+    void copy_all(bool waitbar) {
         Progress progress{Progress::Unit::kBytes, waitbar ? "Converting" : nullptr};
         const std::int64_t in_all = wanted_.rasterSize();
         for_each_tile(lines_.count(), samples_.count(), 1, [&](const Tile& tile) {
@@ -54,16 +90,15 @@ public:
                 sample_offset(wanted_, tile.first_line + tile.lines - 1, tile.first_sample + tile.samples),
                 in_all);
         });
-        throw_if_interrupted();
-        out_.commit();
     }
 
-private:
     void copy(const Tile& tile) {
         if (tile.first_sample == 0) {
             for (int line = 0; line < tile.lines; ++line) copy_prefix(tile.first_line + line);
         }
-        if (wanted_.CellType == FLOAT_COMPLEX) {
+        if (scaling_.changes()) {
+            wanted_.is_complex() != 0 ? scale_samples(tile, doubles_) : scale_samples(tile, real_doubles_);
+        } else if (wanted_.CellType == FLOAT_COMPLEX) {
             copy_samples(tile, singles_);
         } else if (wanted_.is_complex() != 0) {
             copy_samples(tile, doubles_);
@@ -75,13 +110,29 @@ private:
     }
 
     template <typename T>
-    void copy_samples(const Tile& tile, std::vector<T>& room) {
+    void read_samples(const Tile& tile, std::vector<T>& room) {
         room.resize(tile.size());
         Tile from = tile;
         from.first_line += lines_.first;
         from.first_sample += samples_.first;
         in_.read(from, room.data());
+    }
+    template <typename T>
+    void copy_samples(const Tile& tile, std::vector<T>& room) {
+        read_samples(tile, room);
         out_.write(tile, room.data());
+    }
+    // In double precision, whatever the two types.
+    template <typename T>
+    void scale_samples(const Tile& tile, std::vector<T>& room) {
+        read_samples(tile, room);
+        scaling_.apply(room);
+        if (wanted_.CellType != FLOAT32) return out_.write(tile, room.data());
+        if constexpr (std::is_same_v<T, double>) {  // FLOAT32 is written from its own type
+            real_singles_.resize(room.size());
+            std::ranges::transform(room, real_singles_.begin(), [](T value) { return static_cast<float>(value); });
+            out_.write(tile, real_singles_.data());
+        }
     }
 
     void copy_prefix(int line) {
@@ -100,6 +151,7 @@ private:
 
     Cut lines_, samples_;
     Wanted wanted_;
+    Scaling scaling_;
     RasterReader in_;
     NewRaster out_;
     // One of them holds the samples of a tile.
@@ -124,7 +176,7 @@ void add_convert(CLI::App& app, Job& job) {
     auto options = std::make_shared<ConvertOptions>();
     CLI::App* command = app.add_subcommand("convert", "Cuts and converts a raster of any size");
     command->add_option("IN", options->in, "Raster with a side file IN.hdr")->required();
-    command->add_option("OUT", options->out, "Raster to write; its side file is written last")->required();
+    command->add_option("OUT", options->out, "Raster to write, with a side file OUT.hdr")->required();
     command->add_option("--type", options->type, "Cell type of OUT, such as FLOAT32 or SHORT_COMPLEX");
     command->add_option("--order", options->order, "Byte order of OUT: l little-endian, m big-endian")
         ->check(CLI::IsMember({"l", "m"}));
@@ -132,6 +184,8 @@ void add_convert(CLI::App& app, Job& job) {
     command->add_option("--samples", options->samples, "Samples A:B of each line");
     command->add_option("--prefix", options->prefix, "Line prefixes: keep (default) or drop")
         ->check(CLI::IsMember({"keep", "drop"}));
+    command->add_option("--scale", options->scale, "Factor for every sample (1), before --offset");
+    command->add_option("--offset", options->offset, "What is added to every sample (0)");
     add_waitbar_option(*command, options->waitbar);
     command->callback([options, &job] { job = [options] { return convert(*options); }; });
 }

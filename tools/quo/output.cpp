@@ -5,31 +5,17 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <climits>
-#include <cstdlib>
 
 #include "failure.h"
 #include "interrupt.h"
+#include "sarutillib/file_io.h"
 
 namespace tool {
 namespace {
 
 constexpr std::size_t kBlock = 1 << 16;
 
-mode_t permissions_of_new_files() {
-    const mode_t mask = umask(0);
-    umask(mask);
-    return 0666 & ~mask;
-}
-
 }  // namespace
-
-std::string resolved(const std::string& name) {
-    struct stat about {};
-    if (lstat(name.c_str(), &about) != 0 || !S_ISLNK(about.st_mode)) return name;
-    char path[PATH_MAX];
-    return realpath(name.c_str(), path) != nullptr ? path : name;
-}
 
 Output::Output(const std::string& name) : name_{name == "-" ? "standard output" : name} {
     struct stat about {};
@@ -39,23 +25,13 @@ Output::Output(const std::string& name) : name_{name == "-" ? "standard output" 
         descriptor_ = open(name.c_str(), O_WRONLY | O_CLOEXEC);
         if (descriptor_ < 0) fail();
     } else {
-        target_ = resolved(name);  // so that a symbolic link keeps pointing at the replaced file
-        open_unfinished();
-    }
-}
-
-void Output::open_unfinished() {
-    unfinished_ = target_ + ".XXXXXX";
-    descriptor_ = mkostemp(unfinished_.data(), O_CLOEXEC);
-    if (descriptor_ < 0) {
-        unfinished_.clear();
-        fail();
+        file_ = std::make_unique<quo::AtomicFile>(name.c_str());
+        if (!file_->good()) fail();
     }
 }
 
 Output::~Output() {
     if (descriptor_ > STDERR_FILENO) close(descriptor_);
-    if (!unfinished_.empty()) unlink(unfinished_.c_str());
 }
 
 void Output::fail() const { throw Failure(name_ + ": " + system_cause()); }
@@ -67,6 +43,16 @@ void Output::write(std::string_view text) {
 }
 
 void Output::flush() {
+    throw_if_interrupted();
+    if (!file_) {
+        write_directly();
+    } else if (!file_->write(pending_)) {
+        fail();
+    }
+    pending_.clear();
+}
+
+void Output::write_directly() {
     std::string_view rest = pending_;
     while (!rest.empty()) {
         throw_if_interrupted();
@@ -74,21 +60,11 @@ void Output::flush() {
         if (done < 0 && errno != EINTR) fail();
         if (done > 0) rest.remove_prefix(static_cast<std::size_t>(done));
     }
-    pending_.clear();
-}
-
-void Output::give_permissions() const {
-    struct stat about {};
-    const bool replaces = stat(target_.c_str(), &about) == 0;
-    if (fchmod(descriptor_, replaces ? about.st_mode & 07777 : permissions_of_new_files()) != 0) fail();
 }
 
 void Output::commit() {
     flush();
-    if (unfinished_.empty()) return;
-    give_permissions();
-    if (fsync(descriptor_) != 0 || rename(unfinished_.c_str(), target_.c_str()) != 0) fail();
-    unfinished_.clear();
+    if (file_ && !file_->commit()) fail();
 }
 
 }  // namespace tool

@@ -1,14 +1,15 @@
 #ifndef QUO_TOOL_OUTPUT_H
 #define QUO_TOOL_OUTPUT_H
 
+#include <memory>
 #include <string>
 #include <string_view>
 
-namespace tool {
+namespace quo {
+class AtomicFile;
+}
 
-/** The file that a symbolic link leads to, so that the link keeps pointing at a file that is replaced; any other
- * name as it stands. */
-std::string resolved(const std::string& name);
+namespace tool {
 
 /** Where a result goes: standard output for "-", else a file that appears under its name in one step.
  *
@@ -29,11 +30,11 @@ public:
     void commit();
 
 private:
-    void open_unfinished();
-    void give_permissions() const;
+    void write_directly();
     [[noreturn]] void fail() const;
 
-    std::string name_, target_, unfinished_;  // unfinished_ is empty where the output is written to directly
+    std::string name_;
+    std::unique_ptr<quo::AtomicFile> file_;  // none where the output is written to directly
     int descriptor_ = -1;
     std::string pending_;
 };

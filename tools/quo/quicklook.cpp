@@ -84,6 +84,8 @@ public:
 
     [[nodiscard]] std::size_t width() const { return width_; }
     [[nodiscard]] std::size_t height() const { return height_; }
+    /** Whether any sample has a power that is a finite number. */
+    [[nodiscard]] bool has_power() const { return has_power_; }
     /** Row after row; values that are no number count as 0. */
     [[nodiscard]] const std::vector<float>& power() const { return power_; }
 
@@ -101,7 +103,9 @@ private:
             for (int pixel = 0; pixel < tile.samples / looks_.range; ++pixel) {
                 for (int look = 0; look < looks_.range; ++look) {
                     const float value = std::norm(*from++);
-                    to[pixel] += std::isfinite(value) ? value : 0.0F;
+                    const bool finite = std::isfinite(value);
+                    to[pixel] += finite ? value : 0.0F;
+                    has_power_ |= finite;
                 }
             }
         }
@@ -111,6 +115,7 @@ private:
     std::size_t width_, height_;
     RasterReader file_;
     std::vector<float> power_;
+    bool has_power_ = false;
     std::vector<float> real_;  // the samples of a tile, as the raster has them
     std::vector<fcomplex> complex_;
 };
@@ -166,6 +171,8 @@ int quicklook(const QuicklookOptions& options) {
         picture.grey.push_back(static_cast<std::uint8_t>(std::lround(255.0 * std::clamp(share, 0.0, 1.0))));
     }
     write_png(picture, options.picture);
+    if (!multilook.has_power())
+        complain(options.raster + ": no sample has a power that is a finite number, the picture is black");
     return kFine;
 }
 

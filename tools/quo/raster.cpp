@@ -1,8 +1,5 @@
 #include "raster.h"
 
-#include <fcntl.h>
-#include <unistd.h>
-
 #include <algorithm>
 #include <array>
 #include <cctype>
@@ -11,11 +8,11 @@
 #include <complex>
 #include <filesystem>
 #include <optional>
+#include <system_error>
 #include <type_traits>
 
 #include "failure.h"
 #include "interrupt.h"
-#include "output.h"
 
 namespace tool {
 namespace {
@@ -23,7 +20,6 @@ namespace {
 constexpr std::array<std::string_view, 10> kNames{"FLOAT_COMPLEX", "FLOAT32", "DOUBLE_COMPLEX", "FLOAT64",
                                                   "INT32_COMPLEX", "INT32",   "SHORT_COMPLEX",  "INT16",
                                                   "INT8_COMPLEX",  "INT8"};
-constexpr std::size_t kLongestName = 511;  // of the library's raster files
 
 template <typename T>
 constexpr bool kIsComplex = std::is_same_v<T, fcomplex> || std::is_same_v<T, dcomplex>;
@@ -67,12 +63,46 @@ bool can_be_replaced(const std::string& name) {
     return kind == std::filesystem::file_type::not_found || kind == std::filesystem::file_type::regular;
 }
 
-// What the system has taken but cannot store is found here.
-bool reaches_the_disk(const std::string& name) {
-    const int descriptor = open(name.c_str(), O_RDONLY | O_CLOEXEC);
-    if (descriptor < 0) return false;
-    const bool done = fsync(descriptor) == 0;
-    return close(descriptor) == 0 && done;
+std::string cause_of(const BufferFile& file) {
+    return file.systemError() != 0 ? std::generic_category().message(file.systemError())
+                                   : status_text(file.status());
+}
+
+// The first values that are rounded beyond a type.
+struct Beyond {
+    double low, high;
+};
+std::optional<Beyond> beyond(int cell_type) {
+    switch (cell_type) {
+        case INT32:
+        case INT_COMPLEX:
+            return Beyond{-2147483648.5, 2147483647.5};
+        case INT16:
+        case SHORT_COMPLEX:
+            return Beyond{-32768.5, 32767.5};
+        case INT8:
+        case INT8_COMPLEX:
+            return Beyond{-128.5, 127.5};
+        default:
+            return std::nullopt;
+    }
+}
+
+bool is_lost(double value) { return std::isnan(value); }
+bool is_lost(const dcomplex& value) { return std::isnan(value.real()) || std::isnan(value.imag()); }
+bool is_clipped(double value, const Beyond& limit) { return value <= limit.low || value >= limit.high; }
+bool is_clipped(const dcomplex& value, const Beyond& limit) {
+    return !is_lost(value) && (is_clipped(value.real(), limit) || is_clipped(value.imag(), limit));
+}
+
+template <typename T>
+void count_losses(const T* from, std::size_t count, int cell_type, Losses& losses) {
+    const auto limit = beyond(cell_type);
+    if (!limit) return;
+    for (const T* value = from; value != from + count; ++value) {
+        losses.lost += is_lost(*value) ? 1 : 0;
+        losses.clipped += is_clipped(*value, *limit) ? 1 : 0;
+    }
 }
 
 }  // namespace
@@ -135,12 +165,12 @@ RasterReader::RasterReader(std::string name, const RasterDescription& descriptio
     : name_{std::move(name)}, file_{name_.c_str()} {
     file_.copyDescription(description);
     file_.open(BufferFile::READ);
-    if (!file_.is_open()) throw Failure(name_ + ": cannot be opened");
+    if (!file_.is_open()) throw Failure(name_ + ": cannot be opened: " + cause_of(file_));
 }
 
 void RasterReader::fail() const {
     throw_if_interrupted();
-    throw Failure(name_ + ": cannot be read");
+    throw Failure(name_ + ": cannot be read: " + cause_of(file_));
 }
 
 void RasterReader::read_bytes(std::int64_t offset, char* to, std::int64_t bytes) {
@@ -161,9 +191,8 @@ void RasterReader::read(const Tile& tile, T* to) {
         }
     }
     if (!is_narrow(file_)) {
-        file_.seek(1, BufferFile::FROM_START);  // a block that cannot be read leaves the place alone
         file_.readbuffer(to, tile.first_line, tile.lines, tile.first_sample, tile.samples);
-        if (file_.tell() == 1) fail();
+        if (file_.status() != QUO_OK) fail();
         return;
     }
     const auto samples = static_cast<std::size_t>(tile.samples);
@@ -179,40 +208,21 @@ template void RasterReader::read(const Tile&, double*);
 template void RasterReader::read(const Tile&, fcomplex*);
 template void RasterReader::read(const Tile&, dcomplex*);
 
-NewRaster::NewRaster(const std::string& name, const RasterDescription& description)
-    : target_{resolved(name)}, side_file_{resolved(name + ".hdr")} {
-    for (const std::string& file : {target_, side_file_}) {
+NewRaster::NewRaster(const std::string& name, const RasterDescription& description) : name_{name} {
+    if (name == "-") throw WrongUse("-: a raster needs a side file, for which standard output has no room");
+    for (const std::string& file : {name, name + ".hdr"}) {
         if (!can_be_replaced(file)) throw Failure(file + ": is no regular file");
     }
-    const std::string ending = ".unfinished." + std::to_string(getpid());
-    const std::string unfinished = target_ + ending;
-    if (std::max(unfinished.size(), side_file_.size() + ending.size()) > kLongestName) {
-        throw Failure(name + ": name too long");
-    }
     file_.copyDescription(description);
-    file_.setFilename(unfinished.c_str());
-    file_.open(BufferFile::WRITE);
-    if (!file_.is_open()) throw Failure(name + ": cannot be created");
-    unfinished_ = unfinished;
-    unfinished_side_file_ = side_file_ + ending;
-}
-
-NewRaster::~NewRaster() {
-    file_.close();
-    for (const std::string& file : {unfinished_, unfinished_side_file_}) {
-        if (!file.empty()) unlink(file.c_str());
-    }
+    file_.setFilename(name.c_str());
+    const int status = file_.create();
+    if (status == QUO_REFUSED) throw Failure(name + ": name too long");
+    if (status != QUO_OK) throw Failure(name + ": cannot be created with its side file: " + cause_of(file_));
 }
 
 void NewRaster::fail() const {
     throw_if_interrupted();
-    throw Failure(target_ + ": cannot be written, is the disk full?");
-}
-
-void NewRaster::require_length(std::int64_t length) const {
-    std::error_code error;
-    const auto there = std::filesystem::file_size(unfinished_, error);
-    if (error || there < static_cast<std::uintmax_t>(length)) fail();
+    throw Failure(name_ + ": cannot be written: " + cause_of(file_));
 }
 
 void NewRaster::write_bytes(std::int64_t offset, const char* from, std::int64_t bytes) {
@@ -223,6 +233,7 @@ void NewRaster::write_bytes(std::int64_t offset, const char* from, std::int64_t 
 template <typename T>
 void NewRaster::write(const Tile& tile, const T* from) {
     if constexpr (std::is_same_v<T, double> || std::is_same_v<T, dcomplex>) {
+        count_losses(from, tile.size(), file_.CellType, losses_);
         if (is_narrow(file_)) {
             const auto samples = static_cast<std::size_t>(tile.samples);
             narrow_.resize(samples * static_cast<std::size_t>(file_.element_sizeof()));
@@ -236,37 +247,25 @@ void NewRaster::write(const Tile& tile, const T* from) {
         }
     }
     file_.writebuffer(from, tile.first_line, tile.lines, tile.first_sample, tile.samples);
-    // Tiles follow each other, so what a full disk did not take is missing at the end.
-    require_length(sample_offset(file_, tile.first_line + tile.lines - 1, tile.first_sample + tile.samples));
+    if (file_.status() != QUO_OK) fail();
 }
 template void NewRaster::write(const Tile&, const float*);
 template void NewRaster::write(const Tile&, const double*);
 template void NewRaster::write(const Tile&, const fcomplex*);
 template void NewRaster::write(const Tile&, const dcomplex*);
 
-void NewRaster::write_side_file() {
-    std::error_code error;
-    if (kind_of(side_file_) == std::filesystem::file_type::regular &&
-        !std::filesystem::copy_file(side_file_, unfinished_side_file_, error)) {
-        throw Failure(side_file_ + ": " + error.message());
-    }
-    if (file_.writehdr(unfinished_side_file_.c_str()) != QUO_OK) throw Failure(side_file_ + ": cannot be written");
-}
-
-void NewRaster::give_name(std::string& unfinished, const std::string& target) {
-    std::error_code error;
-    std::filesystem::rename(unfinished, target, error);
-    if (error) throw Failure(target + ": " + error.message());
-    unfinished.clear();
-}
-
 void NewRaster::commit() {
-    file_.close();
-    require_length(file_.rasterSize());
-    if (!reaches_the_disk(unfinished_)) fail();
-    write_side_file();
-    give_name(unfinished_, target_);
-    give_name(unfinished_side_file_, side_file_);
+    if (file_.commit() != QUO_OK) fail();
+}
+
+void NewRaster::say_losses() const {
+    const std::string all = std::to_string(std::int64_t{file_.NrOfLinesPerImage} * file_.NrOfPixelsPerLine);
+    const auto say = [&](const std::string& what, std::int64_t samples) {
+        if (samples > 0)
+            complain(name_ + ": " + what + ": " + std::to_string(samples) + " of " + all + " samples");
+    };
+    say("clipped to the bounds of " + type_name(file_.CellType), losses_.clipped);
+    say("no number, written as 0", losses_.lost);
 }
 
 }  // namespace tool

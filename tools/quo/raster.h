@@ -74,36 +74,40 @@ private:
     std::vector<signed char> narrow_;  // a line of 8-bit parts
 };
 
+/** How many samples of a raster of integers are not what they should be. */
+struct Losses {
+    std::int64_t clipped = 0;  ///< held at the bounds of the type
+    std::int64_t lost = 0;     ///< no number, which became 0
+};
+
 /** A raster under construction: written beside its final name, named and described by commit(). Whatever happens
- * before, an older raster of that name stays whole and the unfinished one is taken away. */
+ * before, an older raster of that name stays whole, with its side file, and the unfinished one is taken away. */
 class NewRaster {
 public:
-    /** Throws Failure where there can be no raster of that name. */
+    /** Throws Failure where there can be no raster of that name, WrongUse for standard output. */
     NewRaster(const std::string& name, const RasterDescription& description);
-    ~NewRaster();
     NewRaster(const NewRaster&) = delete;
     NewRaster& operator=(const NewRaster&) = delete;
 
     [[nodiscard]] const RasterDescription& description() const { return file_; }
-    /** Writes a tile of double, dcomplex or, for FLOAT32 and FLOAT_COMPLEX, float and fcomplex. Tiles come in the
-     * order of for_each_tile. Values for integers are rounded half away from zero and held at the bounds. Throws
-     * Failure where the disk does not take it. */
+    /** Writes a tile of double, dcomplex or, for FLOAT32 and FLOAT_COMPLEX, float and fcomplex. Values for
+     * integers are rounded half away from zero and held at the bounds, which is counted. Throws Failure where the
+     * disk does not take it. */
     template <typename T>
     void write(const Tile& tile, const T* from);
     /** Writes bytes from `offset` on. Throws Failure. */
     void write_bytes(std::int64_t offset, const char* from, std::int64_t bytes);
-    /** The raster is complete: it takes its name, and then its side file does, in which other sections stay. */
+    /** The raster is complete: it and its side file, in which other sections stay, take their names together. */
     void commit();
+    /** Says on standard error how many of the samples written could not be kept, if any. */
+    void say_losses() const;
 
 private:
-    void write_side_file();
-    void require_length(std::int64_t length) const;
-    static void give_name(std::string& unfinished, const std::string& target);
     [[noreturn]] void fail() const;
 
-    std::string target_, side_file_;
-    std::string unfinished_, unfinished_side_file_;  // empty while there is no such file to take away
+    std::string name_;
     BufferFile file_;
+    Losses losses_;
     std::vector<signed char> narrow_;  // a line of 8-bit parts
 };
 

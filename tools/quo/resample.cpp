@@ -118,13 +118,18 @@ public:
           out_{options.out, Wanted{options, in}} {}
 
     void run(bool waitbar) {
-        Progress progress{Progress::Unit::kBytes, waitbar ? "Resampling" : nullptr};
-        lines_ ? by_strips(progress) : by_lines(progress);
+        resample_all(waitbar);
         throw_if_interrupted();
         out_.commit();
+        out_.say_losses();
     }
 
 private:
+    void resample_all(bool waitbar) {
+        Progress progress{Progress::Unit::kBytes, waitbar ? "Resampling" : nullptr};
+        lines_ ? by_strips(progress) : by_lines(progress);
+    }
+
     [[nodiscard]] const RasterDescription& from() const { return in_.description(); }
     [[nodiscard]] const RasterDescription& to() const { return out_.description(); }
 
@@ -159,8 +164,18 @@ private:
             const int first = static_cast<int>(std::min<std::int64_t>(next, samples - width));
             in_.read({0, lines_in, first, width}, source_.data());
             resampler.run(source_.data(), result_.data());
-            write({0, lines_out, first, width});
+            const int known = static_cast<int>(next) - first;
+            keep_columns(known, width, lines_out);
+            write({0, lines_out, first + known, width - known});
             progress.step((first + width) * std::int64_t{lines_out}, std::int64_t{samples} * lines_out);
+        }
+    }
+
+    // Takes the first columns out of the result: the strip before has them.
+    void keep_columns(int first, int width, int lines) {
+        for (int line = 0; first > 0 && line < lines; ++line) {
+            const auto row = result_.begin() + std::ptrdiff_t{line} * width;
+            std::copy(row + first, row + width, result_.begin() + std::ptrdiff_t{line} * (width - first));
         }
     }
 
@@ -227,7 +242,7 @@ void add_resample(CLI::App& app, Job& job) {
     CLI::App* command =
         app.add_subcommand("resample", "Changes the number of samples or lines of a raster of any size");
     command->add_option("IN", options->in, "Raster with a side file IN.hdr")->required();
-    command->add_option("OUT", options->out, "Raster to write; its side file is written last")->required();
+    command->add_option("OUT", options->out, "Raster to write, with a side file OUT.hdr")->required();
     CLI::App* size = command->add_option_group("New size")->require_option(1);
     size->add_option("--samples", options->samples, "Samples per line")->check(CLI::Range(1, INT_MAX));
     size->add_option("--lines", options->lines, "Lines")->check(CLI::Range(1, INT_MAX));

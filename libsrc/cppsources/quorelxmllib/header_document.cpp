@@ -10,6 +10,7 @@
 #include <new>
 #include <utility>
 
+#include "diagnosticslib/saved_in_place.h"
 #include "quo_base/api.h"
 #include "quorelxmllib/header_source.h"
 #include "sarutillib/file_io.h"
@@ -122,7 +123,7 @@ namespace {
 /** Collects the serializer's small pieces into large writes. */
 class Sink {
 public:
-    explicit Sink(const char* file) : file_{file} { pending_.reserve(kPiece); }
+    explicit Sink(AtomicFile& file) : file_{file} { pending_.reserve(kPiece); }
 
     bool take(std::string_view bytes) {
         if (pending_.size() + bytes.size() > kPiece) flush();
@@ -130,9 +131,10 @@ public:
         pending_ += bytes;  // within the reserved room: cannot throw
         return file_.good();
     }
+    /** Hands over what is still held. */
     bool commit() {
         flush();
-        return file_.good() && file_.commit();
+        return file_.good();
     }
     [[nodiscard]] bool good() const { return file_.good(); }
 
@@ -144,7 +146,7 @@ private:
         pending_.clear();
     }
 
-    AtomicFile file_;
+    AtomicFile& file_;
     std::string pending_;
 };
 
@@ -181,6 +183,13 @@ XmlTree reloaded(xmlDoc* tree) {
 }  // namespace
 
 bool HeaderDocument::save(const char* file) {
+    AtomicFile target{file};
+    const bool saved = save(target) && target.commit();
+    if (saved) warn_if_in_place(target, "HeaderDocument::save", "quorelxml_v2");
+    return saved;
+}
+
+bool HeaderDocument::save(AtomicFile& file) {
     if (stands_in_) return false;
     const XmlErrors errors;
     Sink sink{file};

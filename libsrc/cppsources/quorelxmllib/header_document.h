@@ -13,6 +13,8 @@
 
 namespace quo {
 
+class AtomicFile;
+
 struct FreeXml {
     void operator()(xmlDoc* tree) const noexcept { xmlFreeDoc(tree); }
     void operator()(xmlChar* text) const noexcept { xmlFree(text); }
@@ -70,6 +72,8 @@ public:
     /** Saves the tree, indented and in UTF-8, replacing the file in one step. Nodes found before are not valid
      * afterwards. On failure errno may tell why. */
     [[nodiscard]] bool save(const char* file);
+    /** The same into a file that the caller makes new, alone or with another that belongs to it. */
+    [[nodiscard]] bool save(AtomicFile& file);
 
     /** Whether both `NumberOfChannels` and `Description` stand below the root `QuorelXmlDoc`. */
     [[nodiscard]] bool is_header() const noexcept { return find("NumberOfChannels") && find("Description"); }

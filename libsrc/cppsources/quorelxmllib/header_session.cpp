@@ -99,4 +99,10 @@ int HeaderSession::commit() noexcept {
     });
 }
 
+bool HeaderSession::save(AtomicFile& file) {
+    const bool saved = failed_ == QUO_OK && changed_ && document_->save(file);
+    changed_ = changed_ && !saved;
+    return saved;
+}
+
 }  // namespace quo

@@ -9,6 +9,7 @@
 
 namespace quo {
 
+class AtomicFile;
 class CallFrame;
 class HeaderDocument;
 
@@ -32,6 +33,9 @@ public:
      * @return 0; 1 when the file cannot be saved or could not be read; the status of a write that left the
      * document incomplete, which is then not saved. The old file stays whole. */
     [[nodiscard]] int commit() noexcept;
+    /** Saves what the objects have written into a file that the caller makes new together with another: then there
+     * is nothing left to commit. Reports nothing; where it answers false, errno may tell why. */
+    [[nodiscard]] bool save(AtomicFile& file);
 
     /** The innermost session for a file, or null. Throws std::bad_alloc: an object that missed its session would
      * be saved by itself. */

@@ -6,6 +6,7 @@
 #include <cstring>
 #include <limits>
 #include <new>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -13,10 +14,13 @@
 #include "datafilelib/raster_stream.h"
 #include "datafilelib/sample_kernels.h"
 #include "diagnosticslib/call_frame.h"
+#include "diagnosticslib/saved_in_place.h"
 #include "profilelib/profile_look.h"
 #include "quo_base/profile.h"
+#include "quorelxmllib/header_session.h"
 #include "sarutillib/bounded_text.h"
 #include "sarutillib/checked_size.h"
+#include "sarutillib/file_io.h"
 
 namespace {
 
@@ -24,6 +28,7 @@ constexpr const char* kSource = "datafile";
 constexpr const char* kSection = "RasterInfo";
 constexpr const char* kReadFailed = "File reading failed!";
 constexpr const char* kWriteFailed = "File writing failed!";
+constexpr const char* kSideSuffix = ".hdr";
 constexpr int kDescriptionElements = 6;
 
 struct CellName {
@@ -67,22 +72,29 @@ private:
     bool complete_ = true;
 };
 
-// Statuses of a region transfer as entries of the report.
-int finish(quo::CallFrame& frame, int status) {
+const char* message_of(int status) {
     switch (status) {
-        case QUO_OK:
-            return frame.success();
         case QUO_READ_FAILED:
-            return frame.fail(status, kReadFailed);
+            return kReadFailed;
         case QUO_WRITE_FAILED:
-            return frame.fail(status, kWriteFailed);
+            return kWriteFailed;
         case QUO_NO_MEMORY:
-            return frame.fail(status, "Memory allocation failure");
+            return "Memory allocation failure";
         case QUO_NOT_OPENED:
-            return frame.fail(status, "File not opened!");
+            return "File not opened!";
         default:
-            return frame.fail(status, "The request does not fit the raster");
+            return "The request does not fit the raster";
     }
+}
+
+// The status of a transfer as an entry of the report, which names the caller's line.
+int finish(quo::CallFrame& frame, int status, int line = __builtin_LINE()) {
+    return status == QUO_OK ? frame.success(line) : frame.fail(status, message_of(status), line);
+}
+
+// The same for a call that has reported its own failure.
+int pass(quo::CallFrame& frame, int status, int line = __builtin_LINE()) {
+    return status == QUO_OK ? frame.success(line) : frame.callee(status, line);
 }
 
 bool converts(int cell_type) { return cell_type >= FLOAT_COMPLEX && cell_type <= INT16; }
@@ -135,10 +147,36 @@ int RasterDescription::writeSection(const char* side_file) {
     return writeAuxiliaryFile(side_file, 1, kSection);
 }
 
+int RasterDescription::commitPair(quo::AtomicFile& raster, const char* side_file) {
+    quo::HeaderSession session{side_file};  // or the section would be saved by itself
+    if (const int status = writeSection(side_file)) return status;
+    quo::AtomicFile side{side_file};
+    if (!side.good()) return QUO_NOT_OPENED;
+    if (!session.save(side) || !quo::commit_pair(raster, side)) return QUO_WRITE_FAILED;
+    for (const quo::AtomicFile* file : {&raster, &side})
+        quo::warn_if_in_place(*file, "RasterDescription::commitPair", kSource);
+    return QUO_OK;
+}
+
+int RasterDescription::copyPair(const char* from, const char* to, bool overwrite) {
+    try {
+        std::optional<quo::AtomicFile> raster;
+        const int status = quo::copy_raster(from, to, overwrite, raster);
+        return status != QUO_OK ? status : commitPair(*raster, (std::string{to} + kSideSuffix).c_str());
+    } catch (const std::bad_alloc&) {
+        return QUO_NO_MEMORY;
+    }
+}
+
 DataFile::DataFile() : stream_{std::make_unique<quo::RasterStream>()} {}
 DataFile::~DataFile() { close(); }
 
-std::string DataFile::sideFile() const { return std::string{FileName} + ".hdr"; }
+// Whoever fills the public array by hand may leave out the final NUL: that is no name.
+std::string DataFile::path() const {
+    const std::size_t length = strnlen(FileName, sizeof FileName);
+    return {FileName, length < sizeof FileName ? length : 0};
+}
+std::string DataFile::sideFile() const { return path() + kSideSuffix; }
 
 int DataFile::setFilename(const char* file_name) {
     const std::string_view name = quo::text_or_empty(file_name);
@@ -160,13 +198,14 @@ int DataFile::open(int mode) {
         if (const int status = close()) return frame.callee(status);
         BufferSize = wanted;
     }
-    if (!stream_->open(FileName, kModes[mode].how)) return frame.fail(QUO_NOT_OPENED, "File not opened!");
+    if (!stream_->open(path().c_str(), kModes[mode].how)) return frame.fail(QUO_NOT_OPENED, "File not opened!");
     state_ = kModes[mode].state;
     position_ = 0;
     cursor_ = fill_ = 0;
     pending_ = false;
     if (BufferSize > 0) {
         buffer_.reset(new (std::nothrow) char[static_cast<std::size_t>(BufferSize)]);
+        buffer_size_ = BufferSize;
         if (!buffer_) {
             stream_->close();
             return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
@@ -193,7 +232,7 @@ int DataFile::close() {
 // all of it is still pending.
 int DataFile::flushBuffer() {
     const auto pending = static_cast<std::size_t>(cursor_);
-    if (pending_ && stream_->write_at(position_, buffer_.get(), pending) != pending) return QUO_WRITE_FAILED;
+    if (pending_ && stream_->write_at(position_, buffer_.get(), pending).bytes != pending) return QUO_WRITE_FAILED;
     pending_ = false;
     position_ += cursor_;
     cursor_ = fill_ = 0;
@@ -202,7 +241,7 @@ int DataFile::flushBuffer() {
 
 int DataFile::refill() {
     fill_ = static_cast<std::int32_t>(
-        stream_->read_at(position_, buffer_.get(), static_cast<std::size_t>(BufferSize)));
+        stream_->read_at(position_, buffer_.get(), static_cast<std::size_t>(buffer_size_)).bytes);
     cursor_ = 0;
     return fill_;
 }
@@ -265,7 +304,7 @@ int DataFile::read(char* dst, int64_t n) {
     quo::CallFrame frame{"DataFile::read", kSource};
     if (!is_open() || state_ == 1 || n < 0) return frame.fail(QUO_REFUSED, "The file is not open for reading");
     if (buffer_) return finish(frame, readBuffered(dst, n));
-    if (stream_->read_at(position_, dst, static_cast<std::size_t>(n)) != static_cast<std::size_t>(n)) {
+    if (stream_->read_at(position_, dst, static_cast<std::size_t>(n)).bytes != static_cast<std::size_t>(n)) {
         return frame.fail(QUO_READ_FAILED, kReadFailed);
     }
     position_ += n;
@@ -273,7 +312,7 @@ int DataFile::read(char* dst, int64_t n) {
 }
 
 int DataFile::writeBuffered(const char* src, int64_t n) {
-    if (n < BufferSize - cursor_) {
+    if (n < buffer_size_ - cursor_) {
         std::memcpy(buffer_.get() + cursor_, src, static_cast<std::size_t>(n));
         cursor_ += static_cast<std::int32_t>(n);
         pending_ = true;
@@ -285,7 +324,7 @@ int DataFile::writeBuffered(const char* src, int64_t n) {
 
 int DataFile::writeDirectly(const char* src, int64_t n) {
     const auto bytes = static_cast<std::size_t>(n);
-    if (stream_->write_at(position_, src, bytes) != bytes) return QUO_WRITE_FAILED;
+    if (stream_->write_at(position_, src, bytes).bytes != bytes) return QUO_WRITE_FAILED;
     position_ += n;
     return QUO_OK;
 }
@@ -300,7 +339,7 @@ int64_t DataFile::tell() const { return buffer_ ? position_ + cursor_ : position
 int DataFile::is_open() const { return stream_->is_open() ? 1 : 0; }
 int DataFile::is_buffered() const { return BufferSize > 0 ? 1 : 0; }
 int DataFile::is_writing() const { return state_; }
-int DataFile::exists() const { return quo::raster_exists(FileName) ? 1 : 0; }
+int DataFile::exists() const { return quo::raster_exists(path().c_str()) ? 1 : 0; }
 
 int DataFile::read_hdr(const char* file_name) {
     quo::CallFrame frame{"DataFile::read_hdr", kSource};
@@ -328,7 +367,7 @@ int DataFile::read_hdr(const char* file_name) {
 int DataFile::write_hdr() {
     quo::CallFrame frame{"DataFile::write_hdr", kSource};
     // Without a name the side file would be some ".hdr" of the working directory.
-    if (FileName[0] == '\0') return frame.fail(QUO_REFUSED, "No raster named");
+    if (path().empty()) return frame.fail(QUO_REFUSED, "No raster named");
     if (writeSection(sideFile().c_str()) != QUO_OK) {
         return frame.fail(QUO_REFUSED, "The raster's side file cannot be written");
     }
@@ -339,7 +378,7 @@ int DataFile::clone(const DataFile* source) {
     quo::CallFrame frame{"DataFile::clone", kSource};
     if (source == this) return frame.success();
     if (const int status = close()) return frame.callee(status);
-    quo::copy_bounded(FileName, source->FileName);
+    quo::copy_bounded(FileName, source->path());
     copyDescription(*source);
     BufferSize = source->BufferSize;
     return frame.success();
@@ -351,10 +390,7 @@ int DataFile::copy(const char* file_name, int overwrite) {
     DataFile target;
     target.clone(this);
     if (target.setFilename(file_name) != QUO_OK) return frame.fail(QUO_REFUSED, "File name too long");
-    if (const int status = quo::copy_raster(FileName, target.FileName, overwrite != 0))
-        return finish(frame, status);
-    if (const int status = target.write_hdr()) return frame.callee(status);
-    return frame.success();
+    return finish(frame, target.copyPair(path().c_str(), target.FileName, overwrite != 0));
 }
 
 // Contents come before the buffer's bookkeeping: pending bytes reach the file before a region is moved, and the
@@ -364,6 +400,20 @@ int DataFile::prepareRegion(int64_t next) {
     position_ = next;
     cursor_ = fill_ = 0;
     return QUO_OK;
+}
+
+int DataFile::read(const quo::RasterRegion& region, const quo::RegionLayout& layout, char* dst, int64_t next) {
+    quo::CallFrame frame{"DataFile::read", kSource};
+    if (const int status = prepareRegion(next)) return finish(frame, status);
+    return finish(frame,
+                  dst ? quo::read_region(*stream_, region, layout, dst) : quo::check_region(*stream_, region));
+}
+
+int DataFile::write(const quo::RasterRegion& region, const quo::RegionLayout& layout, const char* src,
+                    int64_t next) {
+    quo::CallFrame frame{"DataFile::write", kSource};
+    if (const int status = prepareRegion(next)) return finish(frame, status);
+    return finish(frame, quo::write_region(*stream_, region, layout, src));
 }
 
 BufferIO::BufferIO(DataFile* file, int first_sample, int samples, int first_line, int lines, int memory_type)
@@ -387,20 +437,16 @@ int BufferIO::readprefix(char* dst) {
     if (const int status = openForReading()) return frame.callee(status);
     quo::RasterRegion region;
     if (File->state_ == 1 || !prefixRegion(region)) return finish(frame, QUO_REFUSED);
-    if (const int status = File->prepareRegion(quo::line_after(*File, FirstLine, Lines)))
-        return finish(frame, status);
-    return finish(frame,
-                  quo::read_region(*File->stream_, region, {nullptr, 0, region.piece, region.piece, false}, dst));
+    const quo::RegionLayout layout{nullptr, 0, region.piece, region.piece, false};
+    return pass(frame, File->read(region, layout, dst, quo::line_after(*File, FirstLine, Lines)));
 }
 
 int BufferIO::writeprefix(const char* src) {
     quo::CallFrame frame{"BufferIO::writeprefix", kSource};
     quo::RasterRegion region;
     if (!File->is_open() || File->state_ == 0 || !prefixRegion(region)) return finish(frame, QUO_REFUSED);
-    if (const int status = File->prepareRegion(quo::line_after(*File, FirstLine, Lines)))
-        return finish(frame, status);
-    return finish(frame,
-                  quo::write_region(*File->stream_, region, {nullptr, 0, region.piece, region.piece, false}, src));
+    const quo::RegionLayout layout{nullptr, 0, region.piece, region.piece, false};
+    return pass(frame, File->write(region, layout, src, quo::line_after(*File, FirstLine, Lines)));
 }
 
 int BufferIO::readbuffer(char* dst, int width) {
@@ -409,17 +455,12 @@ int BufferIO::readbuffer(char* dst, int width) {
     if (const int status = openForReading()) return frame.callee(status);
     const auto region = quo::region_of_samples(*File, FirstLine, Lines, FirstSample, Samples);
     if (File->state_ == 1 || !region || width < Samples) return finish(frame, QUO_REFUSED);
-    if (const int status = File->prepareRegion(quo::line_after(*File, FirstLine, Lines)))
-        return finish(frame, status);
-
+    // Without a kernel the destination stays as it is: callers ask for pairs that have no conversion, and go on.
     const auto kernel = quo::find_kernel(quo::SampleAccess::kRegionRead, File->CellType, MemoryType);
-    if (!kernel) {  // deliberate: a pair without a conversion is no failure, a region beyond the file is
-        return finish(frame, File->stream_->length().value_or(0) < region->end() ? QUO_READ_FAILED : QUO_OK);
-    }
     const auto size = static_cast<std::int64_t>(quo::sample_size(MemoryType));
-    return finish(frame,
-                  quo::read_region(*File->stream_, *region,
-                                   {kernel, Samples, Samples * size, width * size, File->ByteOrder == 1}, dst));
+    const quo::RegionLayout layout{kernel, Samples, Samples * size, width * size, File->ByteOrder == 1};
+    return pass(frame,
+                File->read(*region, layout, kernel ? dst : nullptr, quo::line_after(*File, FirstLine, Lines)));
 }
 
 int BufferIO::writebuffer(const char* src) { return writebuffer(src, Samples); }
@@ -431,10 +472,7 @@ int BufferIO::writebuffer(const char* src, int width) {
     if (!File->is_open() || File->state_ == 0 || !kernel || !region || width < Samples) {
         return finish(frame, QUO_REFUSED);
     }
-    if (const int status = File->prepareRegion(quo::line_after(*File, FirstLine, Lines)))
-        return finish(frame, status);
     const auto size = static_cast<std::int64_t>(quo::sample_size(MemoryType));
-    return finish(frame,
-                  quo::write_region(*File->stream_, *region,
-                                    {kernel, Samples, Samples * size, width * size, File->ByteOrder == 1}, src));
+    const quo::RegionLayout layout{kernel, Samples, Samples * size, width * size, File->ByteOrder == 1};
+    return pass(frame, File->write(*region, layout, src, quo::line_after(*File, FirstLine, Lines)));
 }

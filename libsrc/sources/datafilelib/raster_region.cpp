@@ -5,9 +5,7 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <cstdio>
 #include <cstring>
-#include <string>
 
 #include "diagnosticslib/call_frame.h"
 #include "sarutillib/checked_size.h"
@@ -61,7 +59,7 @@ private:
             const auto bytes = static_cast<std::size_t>(pieces * region_.piece);
             char* room = to_ + done * layout_.memory_piece;
             char* upper = room + pieces * (layout_.memory_piece - region_.piece);
-            if (stream_.read_at(region_.first + done * region_.distance, upper, bytes) != bytes)
+            if (stream_.read_at(region_.first + done * region_.distance, upper, bytes).bytes != bytes)
                 return QUO_READ_FAILED;
             if (layout_.kernel) {
                 layout_.kernel(upper, room, static_cast<std::size_t>(pieces * layout_.samples), layout_.swap);
@@ -80,7 +78,7 @@ private:
         for (std::int64_t done = 0; done < region_.count; done += at_once) {
             const std::int64_t pieces = std::min(at_once, region_.count - done);
             const auto bytes = static_cast<std::size_t>(span(pieces));
-            if (stream_.read_at(region_.first + done * region_.distance, scratch.data(), bytes) != bytes) {
+            if (stream_.read_at(region_.first + done * region_.distance, scratch.data(), bytes).bytes != bytes) {
                 return QUO_READ_FAILED;
             }
             for (std::int64_t i = 0; i < pieces; ++i) {
@@ -107,15 +105,15 @@ private:
     char* to_;
 };
 
-int copy_bytes(const RasterStream& from, const RasterStream& to) {
+int copy_bytes(const RasterStream& from, AtomicFile& to) {
     const auto length = from.length();
     if (!length) return QUO_READ_FAILED;
     TrackedBuffer<char> chunk{static_cast<std::size_t>(kChunk)};
     if (!chunk) return QUO_NO_MEMORY;
     for (std::int64_t done = 0; done < *length; done += kChunk) {
         const auto bytes = static_cast<std::size_t>(std::min(kChunk, *length - done));
-        if (from.read_at(done, chunk.data(), bytes) != bytes) return QUO_READ_FAILED;
-        if (to.write_at(done, chunk.data(), bytes) != bytes) return QUO_WRITE_FAILED;
+        if (from.read_at(done, chunk.data(), bytes).bytes != bytes) return QUO_READ_FAILED;
+        if (!to.write({chunk.data(), bytes})) return QUO_WRITE_FAILED;
     }
     return QUO_OK;
 }
@@ -154,10 +152,15 @@ std::int64_t line_after(const RasterDescription& raster, std::int64_t first_line
     return place.value().value_or(raster.HeaderOffset);
 }
 
-int read_region(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout, char* to) {
+int check_region(const RasterStream& stream, const RasterRegion& region) {
     if (region.count == 0 || region.piece == 0) return QUO_OK;
     const auto length = stream.length();
-    if (!length || region.end() > *length) return QUO_READ_FAILED;
+    return length && region.end() <= *length ? QUO_OK : QUO_READ_FAILED;
+}
+
+int read_region(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout, char* to) {
+    if (const int status = check_region(stream, region)) return status;
+    if (region.count == 0 || region.piece == 0) return QUO_OK;
     return RegionReader{stream, region, layout, to}.run();
 }
 
@@ -180,26 +183,21 @@ int write_region(const RasterStream& stream, const RasterRegion& region, const R
             }
         }
         const auto bytes = static_cast<std::size_t>(pieces * region.piece);
-        if (stream.write_at(region.first + done * region.distance, scratch.data(), bytes) != bytes) {
+        if (stream.write_at(region.first + done * region.distance, scratch.data(), bytes).bytes != bytes) {
             return QUO_WRITE_FAILED;
         }
     }
     return QUO_OK;
 }
 
-int copy_raster(const char* from, const char* to, bool overwrite) {
-    if (same_file(from, to) || (!overwrite && access(to, F_OK) == 0)) return QUO_REFUSED;
-    errno = 0;
-    RasterStream source, target;
+int copy_raster(const char* from, const char* to, bool overwrite, std::optional<AtomicFile>& copy) {
+    const bool refused = same_file(from, to) || (!overwrite && access(to, F_OK) == 0);
+    errno = 0;  // that a file is missing is no failure here
+    if (refused) return QUO_REFUSED;
+    RasterStream source;
     if (!source.open(from, RasterStream::Mode::kRead)) return QUO_NOT_OPENED;
-    // Under another name until it is whole, so that an old raster survives a failure.
-    const std::string unfinished = std::string{to} + ".part";
-    if (!target.open(unfinished.c_str(), RasterStream::Mode::kCreate)) return QUO_NOT_OPENED;
-    int status = copy_bytes(source, target);
-    const bool closed = target.close();
-    if (status == QUO_OK && (!closed || std::rename(unfinished.c_str(), to) != 0)) status = QUO_WRITE_FAILED;
-    if (status != QUO_OK) unlink(unfinished.c_str());
-    return status;
+    copy.emplace(to);
+    return copy->good() ? copy_bytes(source, *copy) : QUO_NOT_OPENED;
 }
 
 }  // namespace quo

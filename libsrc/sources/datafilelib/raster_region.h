@@ -7,6 +7,7 @@
 
 #include "datafilelib/raster_stream.h"
 #include "datafilelib/sample_kernels.h"
+#include "sarutillib/file_io.h"
 
 namespace quo {
 
@@ -39,15 +40,18 @@ struct RegionLayout {
     bool swap;                  ///< the file has the other byte order
 };
 
+/** 0, or 4 when the file ends before the region. */
+int check_region(const RasterStream& stream, const RasterRegion& region);
+
 /** Moves a whole region with few large transfers. 0, 4 when the file ends before the region (nothing is touched
  * then), 5, or 7. */
 int read_region(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout, char* to);
 int write_region(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout,
                  const char* from);
 
-/** Copies a file's bytes as they are, holes included; a partial copy is removed. 0, 1 when the target exists and
+/** Copies a file's bytes as they are into a new file, which the caller commits. 0, 1 when the target exists and
  * must be kept or is the source itself, 4, 5, 7, 9. */
-int copy_raster(const char* from, const char* to, bool overwrite);
+int copy_raster(const char* from, const char* to, bool overwrite, std::optional<AtomicFile>& copy);
 
 }  // namespace quo
 

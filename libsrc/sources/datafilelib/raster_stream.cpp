@@ -29,7 +29,7 @@ int flags_of(RasterStream::Mode mode) {
 
 // Repeats `step(done, left)` until everything is moved or a step moves nothing.
 template <typename Step>
-std::size_t move_all(std::size_t size, Step step) {
+Transfer move_all(std::size_t size, Step step) {
     std::size_t done = 0;
     while (done < size) {
         const ssize_t moved = step(done, std::min(size - done, kMostAtOnce));
@@ -37,10 +37,10 @@ std::size_t move_all(std::size_t size, Step step) {
             errno = 0;
             continue;
         }
-        if (moved <= 0) break;
+        if (moved <= 0) return {done, moved < 0};
         done += static_cast<std::size_t>(moved);
     }
-    return done;
+    return {done, false};
 }
 
 }  // namespace
@@ -59,6 +59,12 @@ bool RasterStream::open(const char* path, Mode mode) noexcept {
     return true;
 }
 
+bool RasterStream::open_same(int descriptor) noexcept {
+    close();
+    descriptor_ = fcntl(descriptor, F_DUPFD_CLOEXEC, 0);
+    return descriptor_ >= 0;
+}
+
 bool RasterStream::close() noexcept {
     if (descriptor_ < 0) return true;
     const bool closed = ::close(descriptor_) == 0;
@@ -72,15 +78,15 @@ std::optional<std::int64_t> RasterStream::length() const noexcept {
     return status.st_size;
 }
 
-std::size_t RasterStream::read_at(std::int64_t offset, void* to, std::size_t size) const noexcept {
-    if (descriptor_ < 0 || offset < 0) return 0;
+Transfer RasterStream::read_at(std::int64_t offset, void* to, std::size_t size) const noexcept {
+    if (descriptor_ < 0 || offset < 0) return {0, true};
     return move_all(size, [&](std::size_t done, std::size_t left) {
         return pread(descriptor_, static_cast<char*>(to) + done, left, offset + static_cast<std::int64_t>(done));
     });
 }
 
-std::size_t RasterStream::write_at(std::int64_t offset, const void* from, std::size_t size) const noexcept {
-    if (descriptor_ < 0 || offset < 0) return 0;
+Transfer RasterStream::write_at(std::int64_t offset, const void* from, std::size_t size) const noexcept {
+    if (descriptor_ < 0 || offset < 0) return {0, true};
     return move_all(size, [&](std::size_t done, std::size_t left) {
         return pwrite(descriptor_, static_cast<const char*>(from) + done, left,
                       offset + static_cast<std::int64_t>(done));

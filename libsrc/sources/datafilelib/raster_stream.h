@@ -7,6 +7,13 @@
 
 namespace quo {
 
+/** What a transfer moved, and whether it is short because the system refused the rest: at the end of the file it
+ * does not, and the bytes beyond are known not to be there. */
+struct Transfer {
+    std::size_t bytes = 0;
+    bool refused = false;
+};
+
 /** An open raster file: whole transfers at 64-bit positions. Folders are refused. */
 class RasterStream {
 public:
@@ -18,15 +25,17 @@ public:
     RasterStream& operator=(const RasterStream&) = delete;
 
     [[nodiscard]] bool open(const char* path, Mode mode) noexcept;
+    /** Reads and writes through another descriptor of a file that somebody else opened for both. */
+    [[nodiscard]] bool open_same(int descriptor) noexcept;
     /** False when what was written could not be handed to the disk. */
     bool close() noexcept;
     [[nodiscard]] bool is_open() const noexcept { return descriptor_ >= 0; }
     /** Bytes in the file, or nothing when they cannot be told. */
     [[nodiscard]] std::optional<std::int64_t> length() const noexcept;
 
-    /** Bytes moved: fewer than asked for at the end of the file or when the system refuses. */
-    std::size_t read_at(std::int64_t offset, void* to, std::size_t size) const noexcept;
-    std::size_t write_at(std::int64_t offset, const void* from, std::size_t size) const noexcept;
+    /** Where the system refuses, errno tells why. */
+    Transfer read_at(std::int64_t offset, void* to, std::size_t size) const noexcept;
+    Transfer write_at(std::int64_t offset, const void* from, std::size_t size) const noexcept;
 
 private:
     int descriptor_ = -1;

@@ -158,7 +158,7 @@ extern "C" int set_flg_report(int level) noexcept { return report.level = level;
 
 extern "C" void quo_add_report(const char* message, int kind, int line, const char* function,
                                const char* file) noexcept {
-    if (!report.is_open()) return;
+    if (!report.is_open() || quo::call_stack.muted > 0) return;
     const quo::ErrnoKept kept;
     const Entry entry{shown(message), kind, line, shown(function), shown(file)};
     if (report.stream) write_entry(report.stream, report.entries, entry);  // none behind a level that was forced
