@@ -277,7 +277,8 @@ public:
      * @return 0; 1 without a model, with both outputs -1.0; 12. */
     int earth2sat(const double xyz[3], double* t, double* rangeTime) noexcept;
     int earth2sat(const double xyz[3], double* t, double* rangeTime, double doppler) noexcept;
-    /** As earth2sat(), with the first guess found on the coarse polynomial through the whole orbit. */
+    /** As earth2sat(), with the first guess found on the coarse polynomial through the whole orbit, up to half a
+     * revolution. */
     int earth2satPrecise(const double xyz[3], double* t, double* rangeTime) noexcept;
     int earth2satPrecise(const double xyz[3], double* t, double* rangeTime, double doppler) noexcept;
     /** One output of earth2sat(): -1.0 without a model, not-a-number after another failure. */

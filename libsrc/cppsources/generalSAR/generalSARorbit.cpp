@@ -76,9 +76,9 @@ struct Resampled {
  * build(). */
 int make_resampled(const quo::StateVectors& old, double t0, std::int32_t intervals, Resampled& made) noexcept {
     const auto values = 3 * (static_cast<std::size_t>(intervals) + 1);
-    made = {std::unique_ptr<double[]>{new (std::nothrow) double[values]},
-            std::unique_ptr<double[]>{new (std::nothrow) double[values]},
-            quo::OrbitModel::create(intervals + 1)};
+    made.positions.reset(new (std::nothrow) double[values]);
+    made.velocities.reset(new (std::nothrow) double[values]);
+    made.model = quo::OrbitModel::create(intervals + 1);
     if (!made.positions || !made.velocities || !made.model) return QUO_NO_MEMORY;
     const double last = old.place(old.count - 1);
     const quo::StateInterpolation interpolation{old};
@@ -87,8 +87,8 @@ int make_resampled(const quo::StateVectors& old, double t0, std::int32_t interva
         interpolation.at(static_cast<double>(i) / intervals * last, &made.positions[at], &made.velocities[at]);
     }
     const double length = last * old.spacing_s;
-    const int status = made.model->build(
-        {made.positions.get(), made.velocities.get(), intervals + 1, length / intervals}, t0);
+    const int status =
+        made.model->build({made.positions.get(), made.velocities.get(), intervals + 1, length / intervals}, t0);
     made.model->note_resampling(interpolation.error_m());
     return status;
 }
@@ -190,8 +190,7 @@ int Obj::computeApproximateSV() noexcept {
     quo::CallFrame frame{"GeneralSAROrbit::computeApproximateSV", kSource};
     if (model_) model_->drop();
     if (!model_ || model_->vectors() != nSV_n) return frame.fail(QUO_REFUSED, kTooFew);
-    if (!quo::OrbitModel::valid_times(t0SV_s, dtSV_s, nSV_n))
-        return frame.fail(QUO_REFUSED, kBadTimes);
+    if (!quo::OrbitModel::valid_times(t0SV_s, dtSV_s, nSV_n)) return frame.fail(QUO_REFUSED, kBadTimes);
     if (const int status = model_->build(states_of(*this), t0SV_s)) return frame.callee(status);
     return frame.success();
 }

@@ -33,11 +33,15 @@ bool finite_point(const double xyz[3]) noexcept { return xyz && std::isfinite(xy
  * choice within the run. */
 constexpr double kFirstRoot = 1.0, kOtherRoot = -1.0;
 
+/** On longer arcs straight flight is no guess, and already on shorter ones the coarse curve is none: it leads to
+ * the far side of the Earth, where the equations have a solution, too. */
+constexpr double kLongArc_rad = 5.0, kLongCoarseArc_rad = 3.0;
+
 /** When the point is seen where the first guess does not lead there: from the other guess through the whole orbit,
  * from the nearest state vector, or wherever the Doppler equation changes sign. 0 or 12. */
 int search_times(const quo::OrbitModel& model, const quo::Target& target, quo::PointTimes* found) noexcept {
     quo::PointTimes guess{};
-    if (!model.long_arc() && target.fd_hz != 0.0 &&
+    if (model.arc_rad() <= kLongArc_rad && target.fd_hz != 0.0 &&
         model.linear_guess(target.point, target.range_rate_m_s(), kOtherRoot, &guess) &&
         model.solve_anywhere(guess.since_first_s, target, found) == QUO_OK)
         return QUO_OK;
@@ -50,7 +54,7 @@ int find_times(quo::OrbitModel& model, const quo::Target& target, bool precise, 
                double* range_s) noexcept {
     const double rate = target.range_rate_m_s();
     quo::PointTimes guess{};
-    if (!model.long_arc()) {
+    if (model.arc_rad() <= (precise ? kLongCoarseArc_rad : kLongArc_rad)) {
         const bool at_hand =
             !precise && model.guess_on_current(target.point, rate, kFirstRoot, &guess.since_first_s);
         if (at_hand || model.linear_guess(target.point, rate, kFirstRoot, &guess)) {
@@ -173,8 +177,7 @@ int Obj::earth2satLinear(const double xyz[3], double* t, double* rangeTime, doub
     if (!t || !rangeTime || !finite_point(xyz) || !std::isfinite(rate))
         return frame.fail(QUO_REFUSED, kBadArgument);
     quo::PointTimes guess{};
-    if (!model_->linear_guess(quo::load(xyz), rate, kFirstRoot, &guess))
-        return frame.callee(QUO_NOT_SEEN);
+    if (!model_->linear_guess(quo::load(xyz), rate, kFirstRoot, &guess)) return frame.callee(QUO_NOT_SEEN);
     *t = model_->first_time() + guess.since_first_s;
     *rangeTime = guess.range_s;
     return frame.success();

@@ -14,7 +14,6 @@ namespace {
 // A run is kept from this many spacings after its first vector to this many; beyond, another one is closer.
 constexpr double kKeepFrom = 0.6, kKeepUntil = 3.4;
 constexpr double kEndTolerance_s = 1e-4;
-constexpr double kLongArc_rad = 5.0;
 
 void difference(const double from[3], const double to[3], double time_s, double velocity_m_s[3]) noexcept {
     for (int axis = 0; axis < 3; ++axis) velocity_m_s[axis] = (to[axis] - from[axis]) / time_s;
@@ -93,7 +92,7 @@ int OrbitModel::fit_whole(const StateVectors& states) noexcept {
     double velocity[3];
     difference(states.position(0), states.position(vectors() - 1), length(), velocity);
     mean_ = StraightFlight::of(velocity);
-    long_arc_ = std::abs(run(0).chord.speed_m_s) * length() > kLongArc_rad * norm(run(0).start());
+    arc_rad_ = std::abs(run(0).chord.speed_m_s) * length() / norm(run(0).start());
     return orb_interp(0.0, step, positions, velocities, kRunVectors, coarse_x_, coarse_y_, coarse_z_);
 }
 

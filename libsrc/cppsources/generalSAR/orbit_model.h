@@ -70,7 +70,7 @@ struct OrbitModelValues {
     StraightFlight mean_{};                                 // from the first vector to the last
     double coarse_x_[5]{}, coarse_y_[5]{}, coarse_z_[5]{};  // the whole orbit, in the time since the first vector
     double resampling_m_ = 0.0;  // what the interpolation that made the vectors may have left
-    bool long_arc_ = false;
+    double arc_rad_ = 0.0;
     bool ready_ = false;
 };
 
@@ -146,8 +146,8 @@ public:
     int search_all(const Target& target, PointTimes* found) const noexcept;
     /** Time since the first vector of the run that starts nearest to the point. */
     double nearest_start(const Vec3& point) const noexcept;
-    /** Whether the platform flies so far round the Earth that the linear guess means nothing. */
-    [[nodiscard]] bool long_arc() const noexcept { return long_arc_; }
+    /** How far the platform flies round the Earth, about, as an angle. */
+    [[nodiscard]] double arc_rad() const noexcept { return arc_rad_; }
 
 private:
     OrbitModel(std::unique_ptr<OrbitRun[]> runs, std::int32_t count) noexcept
