@@ -6,6 +6,10 @@
 #include "quo_base/api.h"
 #include "quo_base/quorelxml_v2.h"
 
+namespace quo {
+struct PolynomialLists;
+}
+
 /** @file
  * Polynomials in range and azimuth time, and the set of them that describes a product.
  *
@@ -184,11 +188,20 @@ public:
     std::unique_ptr<polyGR2SL[]> GR2SL;        ///< ngr2sl ground-to-slant polynomials
     std::unique_ptr<polySL2THETA[]> SL2THETA;  ///< nsl2theta incidence angles
     std::unique_ptr<polySL2PHI[]> SL2PHI;      ///< nsl2phi look angles
-    /** Lengths of the lists. */
+    /** Lengths of the lists. One that is raised above what CreatePolys() made counts as that; a list put in place
+     * by hand is as long as its length says. */
     int32_t ndc = 0, nfr = 0, nsl2gr = 0, ngr2sl = 0, nsl2theta = 0, nsl2phi = 0;
 
 protected:
     void refreshParameters() override;
+
+private:
+    friend struct quo::PolynomialLists;
+    struct Made {
+        const void* list;
+        int32_t length;
+    };
+    Made made_[6] = {};  // by CreatePolys(), in the order of the lists
 };
 
 #endif

@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <memory>
 #include <string>
 #include <vector>
 
@@ -257,6 +258,33 @@ TEST(PolySARSet, ReadsAParameterFile) {
     ASSERT_EQ(set.readhdr(file.c_str()), 0);
     ASSERT_EQ(set.ndc, 1);
     EXPECT_THAT(set.DC[0].pol, testing::ElementsAre(1, 2, 3, 4, 5, 6, 7));
+}
+
+// The counts are public: a raised one was written, copied and evaluated from beyond the list.
+TEST(PolySARSet, HoldsWhatItsListsHoldWhateverTheCountsSay) {
+    const test::TemporaryFolder folder;
+    polySAR set, copy, read;
+    ASSERT_EQ(set.CreatePolys(2, 1), 0);
+    set.DC[1].pol[0] = 17.3;
+    set.DC[1].taz0 = 1.0;
+    const auto raise = [&set] { set.ndc = set.nfr = set.nsl2phi = 100000; };
+    raise();
+    EXPECT_EQ(set.EvaluateDC(0.0, 1e9), 17.3);
+    int last = 0;
+    EXPECT_EQ(set.getDCnum(1e9, &last), 0);
+    EXPECT_EQ(last, 1);
+    EXPECT_EQ(set.EvaluateSL2PHI(0.0, 0.0), 0.0);
+    ASSERT_EQ(set.clone(&copy), 0);
+    EXPECT_EQ(copy.ndc + 10 * copy.nfr + 100 * copy.nsl2phi, 12);
+    raise();
+    ASSERT_EQ(set.writehdr(folder.file("set.xml").c_str()), 0);
+    ASSERT_EQ(read.readhdr(folder.file("set.xml").c_str()), 0);
+    EXPECT_EQ(read.ndc + 10 * read.nfr + 100 * read.nsl2phi, 12);
+
+    set.FR = std::make_unique<polyFR[]>(3);  // a list of one's own is as long as its count says
+    set.nfr = 3;
+    ASSERT_EQ(set.clone(&copy), 0);
+    EXPECT_EQ(copy.nfr, 3);
 }
 
 std::string counts_header(const char* ndc) {

@@ -1,9 +1,11 @@
 #include <gtest/gtest.h>
 
+#include <cmath>
 #include <cstdint>
 #include <filesystem>
 #include <limits>
 #include <string>
+#include <type_traits>
 #include <vector>
 
 #include "orbit/made_orbits.h"
@@ -214,6 +216,36 @@ TEST(OrbitMemory, OutlivesAFailingCaller) {
     deccurdep();
     EXPECT_GT(test::norm(test::position_at(orbit, kTimes.at(2))), 7e6);
     EXPECT_GT(orbit.pSV_m[0] * orbit.pSV_m[0], 0.0);
+}
+
+// The count is public: one raised by hand once made SVCheck() read, and a header be written, beyond the arrays.
+template <typename Orbit>
+void expect_raised_count_harmless() {
+    const test::TemporaryFolder folder;
+    GeneralSAROrbit full;
+    fill(full);
+    ASSERT_EQ(full.writehdr(folder.file("full.xml").c_str()), 0);
+    Orbit raised, copy, back;
+    ASSERT_EQ(raised.readhdr(folder.file("full.xml").c_str()), 0);
+    raised.nSV_n = 300000;
+    if constexpr (std::is_same_v<Orbit, GeneralSAROrbit>) {
+        std::vector<SVFinding> findings;
+        EXPECT_EQ(raised.SVCheck(findings), 0);
+        EXPECT_TRUE(findings.empty());
+        EXPECT_EQ(raised.SVResample(5.0), QUO_REFUSED);
+        EXPECT_TRUE(std::isnan(raised.orbitFitError()));
+    }
+    ASSERT_EQ(raised.clone(&copy), 0);
+    EXPECT_EQ(copy.nSV_n, kTimes.count);
+    EXPECT_EQ(copy.pSV_m[3 * kTimes.count - 1], raised.pSV_m[3 * kTimes.count - 1]);
+    raised.nSV_n = 300000;
+    ASSERT_EQ(raised.writehdr(folder.file("raised.xml").c_str()), 0);
+    ASSERT_EQ(back.readhdr(folder.file("raised.xml").c_str()), 0);
+    EXPECT_EQ(back.nSV_n, kTimes.count);
+}
+TEST(RaisedCount, CountsAsWhatWasAllocated) {
+    expect_raised_count_harmless<GeneralSAROrbit>();
+    expect_raised_count_harmless<SAROrbitStateVectors_Obj>();
 }
 
 }  // namespace

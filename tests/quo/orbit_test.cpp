@@ -112,4 +112,57 @@ TEST_F(Orbit, DescendingScenesDescend) {
                 testing::HasSubstr("direction      descending\n"));
 }
 
+/** The header without one of its state vectors, as a file from which a line was lost. */
+std::string without_vector(std::string header, std::size_t vector, int vectors_left) {
+    for (const char* array : {"<pSV_m>", "<vSV_mOs>"}) {
+        std::size_t at = header.find(array);
+        for (std::size_t i = 0; i <= 3 * vector; ++i) at = header.find("<val>", at + 1);
+        std::size_t end = at;
+        for (int i = 0; i < 3; ++i) end = header.find("</val>", end) + 6;
+        header.erase(at, end - at);
+    }
+    const std::size_t count = header.find("<nSV_n>") + 7;
+    return header.replace(count, header.find('<', count) - count, std::to_string(vectors_left));
+}
+
+// Every time behind the gap was wrong by 10 s, 41 km on the ground, with exit status 0.
+TEST_F(Orbit, WithAGapIsShownAndNotWorkedWith) {
+    const std::string header = without_vector(header_of(orbit_, {.vectors = 16}), 8, 15);
+    const auto shown = show_file(header);
+    EXPECT_EQ(shown.exit_status, 1);
+    EXPECT_THAT(shown.out, testing::HasSubstr("finding        state vector 8: comes after a gap of 1 missing"));
+    for (const std::vector<std::string>& job : std::vector<std::vector<std::string>>{
+             {"geolocate", header_, "--to", "radar"},
+             {"geolocate", header_, "--to", "ground", "--resample", "5"},
+             {"tiepoints", header_},
+             {"derive", header_, "--region", "0.0055", "1e-4", "1167930300", "1"}}) {
+        const auto refused = quo(job, "azimuth_time_s,range_time_s\n1167930310.25,0.0056\n");
+        EXPECT_EQ(refused.exit_status, 1) << job[0];
+        EXPECT_EQ(refused.out, "");
+        EXPECT_EQ(refused.err, "quo: " + header_ + ": state vector 8: comes after a gap of 1 missing vectors\n");
+    }
+}
+
+// Each of these said no more than the option's name and value.
+TEST_F(Orbit, SaysWhatIsWrongWithAStep) {
+    test::write_text(header_, header_of(orbit_, {}));
+    const struct {
+        std::vector<std::string> job;
+        const char* cause;
+    } rows[] = {
+        {{"orbit", header_, "--every", "inf"}, "--every inf: the step must be a number of seconds above 0"},
+        {{"orbit", header_, "--every", "0"}, "--every 0: the step must be a number of seconds above 0"},
+        {{"orbit", header_, "--every", "1e-9"}, "--every 1e-09: that makes 8e+10 steps, at most 1e+07 are shown"},
+        {{"geolocate", header_, "--to", "radar", "--resample", "nan"},
+         "--resample nan: the spacing must be a number of seconds above 0"},
+        {{"geolocate", header_, "--to", "radar", "--resample", "1e-6"},
+         "--resample 1e-06: that makes 8e+07 state vectors, at most 1000000 are made"},
+    };
+    for (const auto& [job, cause] : rows) {
+        const auto refused = quo(job);
+        EXPECT_EQ(refused.exit_status, 2);
+        EXPECT_THAT(refused.err, testing::StartsWith(std::string{"quo: "} + cause));
+    }
+}
+
 }  // namespace

@@ -35,6 +35,7 @@ TEST_P(TiePoints, OfARealSceneAreMet) {
     const auto agreement = nlohmann::json::parse(run.out).at(0);
     EXPECT_EQ(agreement.at("points"), limits.points);
     EXPECT_EQ(agreement.at("without_solution"), 0);
+    EXPECT_EQ(agreement.at("solved"), limits.points);
     EXPECT_EQ(agreement.at("incidence_against"), limits.against);
     const auto largest = [&](const char* quantity) { return agreement.at(quantity).at("largest").get<double>(); };
     EXPECT_LT(largest("azimuth_time_us"), limits.azimuth_us);
@@ -93,7 +94,14 @@ TEST(TiePoints, PointsThatAreNotSeenAreCounted) {
                      "1133090037.5,0.0053,63.7,79.7,0,30\n");
     const auto run = quo({"tiepoints", "--json", scene_file(kSea), "--points", folder.file("points.csv")});
     EXPECT_EQ(run.exit_status, 1);
-    EXPECT_EQ(nlohmann::json::parse(run.out)[0].at("without_solution"), 1);
+    const auto agreement = nlohmann::json::parse(run.out)[0];
+    EXPECT_EQ(agreement.at("without_solution"), 1);
+    // Residuals of no point used to be 0, as if they agreed.
+    EXPECT_EQ(agreement.at("solved"), 0);
+    EXPECT_TRUE(agreement.at("azimuth_time_us").at("rms").is_null());
+    EXPECT_TRUE(agreement.at("incidence_deg").at("largest").is_null());
+    EXPECT_THAT(quo({"tiepoints", scene_file(kSea), "--points", folder.file("points.csv")}).out,
+                testing::ContainsRegex("\n" + kSea + " +1 +0( +-)+\n"));
 }
 
 }  // namespace

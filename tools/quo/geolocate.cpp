@@ -41,7 +41,7 @@ struct Direction {
     int (*solve)(Scene& scene, const double* in, double doppler_hz, double* out);
 };
 
-constexpr Input kDoppler{"doppler_hz"};
+constexpr Input kDoppler{"doppler_hz"}, kHeight{"height_m"};
 
 int to_ground(Scene& scene, const double* in, double doppler_hz, double* out) {
     const double time_s = in[0];
@@ -72,7 +72,7 @@ int to_radar(Scene& scene, const double* in, double doppler_hz, double* out) {
 }
 
 constexpr Input kSample[] = {{"azimuth_time_s"}, {"range_time_s"}};
-constexpr Input kPoint[] = {{"latitude_deg", -90.0, 90.0}, {"longitude_deg", -360.0, 360.0}, {"height_m"}};
+constexpr Input kPoint[] = {{"latitude_deg", -90.0, 90.0}, {"longitude_deg", -360.0, 360.0}, kHeight};
 constexpr const char* kGeometry[] = {"x_m",           "y_m",      "z_m",          "latitude_deg", "longitude_deg",
                                      "incidence_deg", "look_deg", "fm_rate_hz_s", "speed_m_s"};
 constexpr const char* kTimes[] = {"azimuth_time_s", "range_time_s"};
@@ -182,8 +182,16 @@ std::optional<std::string> geolocate_row(Scene& scene, const Table& table, const
     return cause;
 }
 
+// Points are found at height 0: a height beside them would look like theirs.
+void refuse_heights(const Table& table) {
+    if (table.find(kHeight.name))
+        throw Failure(table.input().name() + ": --to ground finds points at height 0 and takes no column " +
+                      kHeight.name);
+}
+
 int geolocate_table(Scene& scene, const GeolocateOptions& options, const Direction& direction) {
     Table table{options.input};
+    if (&direction == &kToGround) refuse_heights(table);
     const Columns columns{table, direction};
     if (&direction == &kToGround) scene.require_look_side();
     if (&direction == &kToGround || columns.has_doppler()) scene.require_wavelength();
@@ -238,8 +246,9 @@ constexpr const char* kDetails =
     "          longitude_deg, incidence_deg, look_deg, fm_rate_hz_s, speed_m_s, status\n"
     "  radar:  reads latitude_deg, longitude_deg, height_m and, if there, doppler_hz; adds azimuth_time_s,\n"
     "          range_time_s, status\n"
-    "Points of --to ground lie on the WGS84 ellipsoid. A computed column whose name is taken gets the prefix\n"
-    "computed_.\n";
+    "Points of --to ground lie on the WGS84 ellipsoid; a column height_m is refused there. A computed column "
+    "whose\n"
+    "name is taken gets the prefix computed_.\n";
 
 }  // namespace
 

@@ -1,3 +1,4 @@
+#include <cmath>
 #include <memory>
 #include <nlohmann/json.hpp>
 #include <optional>
@@ -32,8 +33,13 @@ void append_steps(std::vector<double>& times, const Scene& scene, double step_s)
     constexpr double kMostSteps = 1e7;
     constexpr double kLeeway =
         1e-9;  // of a step: the last vector is one of the times where the step divides the span
+    const std::string option = "--every " + exact(step_s) + ": ";
+    if (!(step_s > 0.0 && std::isfinite(step_s)))
+        throw WrongUse(option + "the step must be a number of seconds above 0");
     const double steps = (scene.last_time() - scene.first_time()) / step_s;
-    if (!(step_s > 0.0 && steps <= kMostSteps)) throw WrongUse("--every " + exact(step_s));
+    if (steps > kMostSteps)
+        throw WrongUse(option + "that makes " + rough(steps) + " steps, at most " + exact(kMostSteps) +
+                       " are shown");
     const auto last = static_cast<std::int64_t>(steps + kLeeway);
     for (std::int64_t i = 0; i <= last; ++i) times.push_back(scene.first_time() + static_cast<double>(i) * step_s);
 }
@@ -140,7 +146,7 @@ std::string as_row(const StateVector& vector) {
 }
 
 int show_orbit(const OrbitOptions& options) {
-    Scene scene{options.header};
+    Scene scene{options.header, Scene::Vectors::kAsTheyAre};
     int outside = 0;
     const auto vectors = state_vectors(scene, times_asked_for(options, scene, outside));
     const auto findings = scene.findings();

@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <cmath>
 
 #include "failure.h"
 #include "number.h"
@@ -51,9 +52,10 @@ std::string why_no_orbit(const char* header, int status) {
 
 }  // namespace
 
-Scene::Scene(const std::string& header) : name_{header} {
+Scene::Scene(const std::string& header, Vectors vectors) : name_{header} {
     require_readable(name_);
     read_orbit();
+    if (vectors == Vectors::kEvenOnly) require_even_vectors();
     read_sampling();
     read_look_side();
 }
@@ -61,6 +63,18 @@ Scene::Scene(const std::string& header) : name_{header} {
 void Scene::read_orbit() {
     if (const int status = orbit_.readhdr(name_.c_str()))
         throw Failure(name_ + ": " + why_no_orbit(name_.c_str(), status));
+}
+
+void Scene::require_even_vectors() const {
+    std::vector<SVFinding> findings;
+    std::string causes;
+    if (orbit_.SVCheck(findings) != 0) throw Failure(name_ + ": the state vectors cannot be checked");
+    for (const SVFinding& finding : findings) {
+        const bool uneven = finding.problem == SVFinding::kGap || finding.problem == SVFinding::kDuplicate ||
+                            finding.problem == SVFinding::kOrder;
+        if (uneven) causes += (causes.empty() ? "" : "; ") + std::string{finding.text};
+    }
+    if (!causes.empty()) throw Failure(name_ + ": " + causes);
 }
 
 void Scene::read_sampling() {
@@ -92,8 +106,13 @@ void Scene::require_look_side() const {
 }
 
 void Scene::resample(double spacing_s) {
+    if (!(spacing_s > 0.0 && std::isfinite(spacing_s)))
+        throw WrongUse("--resample " + exact(spacing_s) + ": the spacing must be a number of seconds above 0");
+    const double vectors = (last_time() - first_time()) / spacing_s + 1.0;
+    if (vectors > GeneralSAROrbit::kMostResampled)
+        throw WrongUse("--resample " + exact(spacing_s) + ": that makes " + rough(vectors) +
+                       " state vectors, at most " + std::to_string(GeneralSAROrbit::kMostResampled) + " are made");
     const int status = orbit_.SVResample(spacing_s);
-    if (status == QUO_REFUSED) throw WrongUse("state vectors " + exact(spacing_s) + " s apart");
     if (status != 0) throw Failure(name_ + ": cannot re-sample the state vectors, status " + status_text(status));
 }
 

@@ -1,6 +1,7 @@
 #ifndef QUO_TOOL_SCENE_H
 #define QUO_TOOL_SCENE_H
 
+#include <cstdint>
 #include <optional>
 #include <string>
 #include <vector>
@@ -13,8 +14,12 @@ namespace tool {
  * header knows them. Options of the command line take precedence. */
 class Scene {
 public:
-    /** Reads a header. Throws Failure where the file cannot be read or holds no usable orbit. */
-    explicit Scene(const std::string& header);
+    /** What is taken of a list of state vectors with gaps, duplicates or vectors out of order. */
+    enum class Vectors : std::uint8_t { kEvenOnly, kAsTheyAre };
+
+    /** Reads a header. Throws Failure where the file cannot be read or holds no usable orbit: also one whose state
+     * vectors are not one spacing apart from each other, as every time would be wrong behind the place. */
+    explicit Scene(const std::string& header, Vectors vectors = Vectors::kEvenOnly);
 
     const std::string& name() const { return name_; }
     GeneralSAROrbit& orbit() { return orbit_; }
@@ -42,6 +47,7 @@ public:
 
 private:
     void read_orbit();
+    void require_even_vectors() const;
     void read_sampling();
     void read_look_side();
 

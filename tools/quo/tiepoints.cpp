@@ -48,6 +48,8 @@ struct Agreement {
     Vertical vertical = Vertical::kEllipsoidNormal;
     std::int64_t points = 0, unsolved = 0;
     std::array<Residuals, kQuantities> residuals;  // in the order of kQuantity
+
+    std::int64_t solved() const { return points - unsolved; }
 };
 
 /** The ground point of a sample at a height above the ellipsoid.
@@ -157,17 +159,18 @@ constexpr std::size_t kNumberWidth = 11;
 
 std::string as_row(const Agreement& agreement, std::size_t name_width) {
     std::string row = agreement.scene + std::string(name_width - agreement.scene.size(), ' ') +
-                      padded(std::to_string(agreement.points), 8);
+                      padded(std::to_string(agreement.points), 8) + padded(std::to_string(agreement.solved()), 8);
     for (const Residuals& residual : agreement.residuals)
-        row += padded(rough(residual.largest()), kNumberWidth) + padded(rough(residual.rms()), kNumberWidth);
+        for (const double value : {residual.largest(), residual.rms()})
+            row += padded(agreement.solved() > 0 ? rough(value) : "-", kNumberWidth);
     return row + "\n";
 }
 
 std::string as_text(const std::vector<Agreement>& list) {
     std::size_t name_width = 5;
     for (const Agreement& agreement : list) name_width = std::max(name_width, agreement.scene.size());
-    std::string first(name_width + 8, ' ');
-    std::string second = "scene" + std::string(name_width - 5, ' ') + "  points";
+    std::string first(name_width + 16, ' ');
+    std::string second = "scene" + std::string(name_width - 5, ' ') + "  points  solved";
     for (const Quantity& quantity : kQuantity) {
         first += padded(quantity.heading, 2 * kNumberWidth);
         second += padded("largest", kNumberWidth) + padded("rms", kNumberWidth);
@@ -183,11 +186,15 @@ std::string as_json(const std::vector<Agreement>& list) {
         const bool geocentric = agreement.vertical == Vertical::kGeocentricRadius;
         nlohmann::ordered_json entry{{"scene", agreement.scene},
                                      {"points", agreement.points},
+                                     {"solved", agreement.solved()},
                                      {"without_solution", agreement.unsolved},
                                      {"incidence_against", geocentric ? "geocentric radius" : "ellipsoid normal"}};
-        for (std::size_t i = 0; i < kQuantities; ++i)
-            entry[kQuantity[i].key] = {{"largest", agreement.residuals[i].largest()},
-                                       {"rms", agreement.residuals[i].rms()}};
+        for (std::size_t i = 0; i < kQuantities; ++i) {
+            auto& quantity = entry[kQuantity[i].key] = {{"largest", nullptr}, {"rms", nullptr}};
+            if (agreement.solved() == 0) continue;  // a residual of no point is none, not 0
+            quantity["largest"] = agreement.residuals[i].largest();
+            quantity["rms"] = agreement.residuals[i].rms();
+        }
         json.push_back(entry);
     }
     return json.dump(2) + "\n";

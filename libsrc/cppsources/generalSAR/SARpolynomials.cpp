@@ -1,6 +1,8 @@
 #include "quo_base/SARpolynomials.h"
 
 #include <algorithm>
+#include <cstddef>
+#include <iterator>
 #include <new>
 #include <optional>
 #include <span>
@@ -15,6 +17,18 @@
 #include "sarutillib/bounded_text.h"
 #include "sarutillib/checked_size.h"
 #include "sarutillib/file_io.h"
+
+/** How long the lists of a set really are: a length is public and may have been raised. */
+struct quo::PolynomialLists {
+    static void note(polySAR& set, std::size_t index, const void* list, std::int32_t length) {
+        set.made_[index] = {list, length};
+    }
+    static std::int32_t held(const polySAR& set, std::size_t index, const void* list, std::int32_t length) {
+        const polySAR::Made& made = set.made_[index];
+        if (!list) return 0;
+        return list == made.list ? std::min(length, made.length) : length;
+    }
+};
 
 namespace {
 
@@ -87,9 +101,10 @@ constexpr Quantity kQuantities[] = {
 template <typename P>
 class List {
 public:
-    List(const Quantity& quantity, const std::unique_ptr<P[]>& polynomials, int count)
-        : quantity_{quantity},
-          p_{polynomials.get(), polynomials ? static_cast<std::size_t>(std::max(count, 0)) : 0} {}
+    List(const polySAR& set, std::size_t index, const std::unique_ptr<P[]>& list, std::int32_t count)
+        : quantity_{kQuantities[index]},
+          p_{list.get(),
+             static_cast<std::size_t>(std::max(quo::PolynomialLists::held(set, index, list.get(), count), 0))} {}
 
     [[nodiscard]] const Quantity& quantity() const { return quantity_; }
     [[nodiscard]] bool empty() const { return p_.empty(); }
@@ -141,17 +156,23 @@ private:
     std::span<const P> p_;
 };
 
-/** Calls `see(list, count)` for the six lists in their order, until it returns a status other than 0. */
+/** Calls `see(index, list, count)` for the six lists in their order, until it returns a status other than 0. */
 template <typename Set, typename See>
 int each_list(Set& set, See see) {
     int status = QUO_OK;
-    static_cast<void>((status = see(kQuantities[0], set.DC, set.ndc)) ||
-                      (status = see(kQuantities[1], set.FR, set.nfr)) ||
-                      (status = see(kQuantities[2], set.SL2GR, set.nsl2gr)) ||
-                      (status = see(kQuantities[3], set.GR2SL, set.ngr2sl)) ||
-                      (status = see(kQuantities[4], set.SL2THETA, set.nsl2theta)) ||
-                      (status = see(kQuantities[5], set.SL2PHI, set.nsl2phi)));
+    static_cast<void>((status = see(0U, set.DC, set.ndc)) || (status = see(1U, set.FR, set.nfr)) ||
+                      (status = see(2U, set.SL2GR, set.nsl2gr)) || (status = see(3U, set.GR2SL, set.ngr2sl)) ||
+                      (status = see(4U, set.SL2THETA, set.nsl2theta)) ||
+                      (status = see(5U, set.SL2PHI, set.nsl2phi)));
     return status;
+}
+
+/** Lowers every count to what its list really holds. */
+void settle_counts(polySAR& set) {
+    each_list(set, [&set](std::size_t index, const auto& list, std::int32_t& count) {
+        count = quo::PolynomialLists::held(set, index, list.get(), count);
+        return QUO_OK;
+    });
 }
 
 template <typename P>
@@ -312,8 +333,10 @@ int polySAR::CreatePolys(int dc, int fr, int sl2gr, int gr2sl, int sl2theta, int
     quo::CallFrame frame{"polySAR::CreatePolys", kSource};
     const int wanted[] = {dc, fr, sl2gr, gr2sl, sl2theta, sl2phi};
     const int* next = wanted;
-    const int status = each_list(*this, [&](const Quantity&, auto& list, std::int32_t& count) {
-        return make_list(list, count, *next++) ? QUO_OK : QUO_NO_MEMORY;
+    const int status = each_list(*this, [&](std::size_t index, auto& list, std::int32_t& count) {
+        const bool made = make_list(list, count, *next++);
+        quo::PolynomialLists::note(*this, index, list.get(), count);
+        return made ? QUO_OK : QUO_NO_MEMORY;
     });
     if (status != QUO_OK) {
         DestroyPolys();
@@ -324,7 +347,7 @@ int polySAR::CreatePolys(int dc, int fr, int sl2gr, int gr2sl, int sl2theta, int
 int polySAR::CreatePolys(int dc, int fr) { return CreatePolys(dc, fr, 0, 0, 0, 0); }
 
 int polySAR::DestroyPolys() {
-    return each_list(*this, [](const Quantity&, auto& list, std::int32_t& count) {
+    return each_list(*this, [](std::size_t, auto& list, std::int32_t& count) {
         list.reset();
         count = 0;
         return QUO_OK;
@@ -332,29 +355,29 @@ int polySAR::DestroyPolys() {
 }
 
 // The operations of one quantity: the list, and the names that its frames carry.
-#define QUO_POLY_OPERATIONS(KIND, index, count)                                                                  \
-    int polySAR::Evaluate##KIND(double r, double a, double* value) const {                                       \
-        return evaluate_selected("polySAR::Evaluate" #KIND, List{kQuantities[index], KIND, count}, r, a, value); \
-    }                                                                                                            \
-    double polySAR::Evaluate##KIND(double r, double a) const {                                                   \
-        double value = 0.0;                                                                                      \
-        Evaluate##KIND(r, a, &value);                                                                            \
-        return value;                                                                                            \
-    }                                                                                                            \
-    int polySAR::Evaluate##KIND##interp(double r, double a, double* value) const {                               \
-        return evaluate_interpolated("polySAR::Evaluate" #KIND "interp", List{kQuantities[index], KIND, count},  \
-                                     r, a, value);                                                               \
-    }                                                                                                            \
-    double polySAR::Evaluate##KIND##interp(double r, double a) const {                                           \
-        double value = 0.0;                                                                                      \
-        Evaluate##KIND##interp(r, a, &value);                                                                    \
-        return value;                                                                                            \
-    }                                                                                                            \
-    int polySAR::get##KIND##poly(double a, double* c) const {                                                    \
-        return get_coefficients("polySAR::get" #KIND "poly", List{kQuantities[index], KIND, count}, a, c);       \
-    }                                                                                                            \
-    int polySAR::get##KIND##num(double a, int* number) const {                                                   \
-        return get_number("polySAR::get" #KIND "num", List{kQuantities[index], KIND, count}, a, number);         \
+#define QUO_POLY_OPERATIONS(KIND, index, count)                                                                 \
+    int polySAR::Evaluate##KIND(double r, double a, double* value) const {                                      \
+        return evaluate_selected("polySAR::Evaluate" #KIND, List{*this, index, KIND, count}, r, a, value);      \
+    }                                                                                                           \
+    double polySAR::Evaluate##KIND(double r, double a) const {                                                  \
+        double value = 0.0;                                                                                     \
+        Evaluate##KIND(r, a, &value);                                                                           \
+        return value;                                                                                           \
+    }                                                                                                           \
+    int polySAR::Evaluate##KIND##interp(double r, double a, double* value) const {                              \
+        return evaluate_interpolated("polySAR::Evaluate" #KIND "interp", List{*this, index, KIND, count}, r, a, \
+                                     value);                                                                    \
+    }                                                                                                           \
+    double polySAR::Evaluate##KIND##interp(double r, double a) const {                                          \
+        double value = 0.0;                                                                                     \
+        Evaluate##KIND##interp(r, a, &value);                                                                   \
+        return value;                                                                                           \
+    }                                                                                                           \
+    int polySAR::get##KIND##poly(double a, double* c) const {                                                   \
+        return get_coefficients("polySAR::get" #KIND "poly", List{*this, index, KIND, count}, a, c);            \
+    }                                                                                                           \
+    int polySAR::get##KIND##num(double a, int* number) const {                                                  \
+        return get_number("polySAR::get" #KIND "num", List{*this, index, KIND, count}, a, number);              \
     }
 QUO_POLY_OPERATIONS(DC, 0, ndc)
 QUO_POLY_OPERATIONS(FR, 1, nfr)
@@ -368,10 +391,12 @@ int polySAR::writehdr(const char* file) {
     quo::CallFrame frame{"polySAR::writehdr", kSource};
     return quo::guarded(frame, [&] {
         quo::JoinedSession session{file};
+        settle_counts(*this);
         if (const int status = writeAuxiliaryFile(file, 1, kSetSection)) return frame.callee(status);
-        const int status = each_list(*this, [file](const Quantity& quantity, auto& list, std::int32_t count) {
+        const int status = each_list(*this, [file](std::size_t index, auto& list, std::int32_t count) {
             for (int i = 0; i < count; ++i) {
-                if (const int failed = list[i].writepar(file, polynomial_name(quantity, i).c_str())) return failed;
+                if (const int failed = list[i].writepar(file, polynomial_name(kQuantities[index], i).c_str()))
+                    return failed;
             }
             return 0;
         });
@@ -397,9 +422,10 @@ int polySAR::readhdr(const char* file) {
         }
         if (const int status = CreatePolys(ndc, nfr, nsl2gr, ngr2sl, nsl2theta, nsl2phi))
             return frame.callee(status);
-        const int status = each_list(*this, [file](const Quantity& quantity, auto& list, std::int32_t count) {
+        const int status = each_list(*this, [file](std::size_t index, auto& list, std::int32_t count) {
             for (int i = 0; i < count; ++i) {
-                if (const int failed = list[i].readpar(file, polynomial_name(quantity, i).c_str())) return failed;
+                if (const int failed = list[i].readpar(file, polynomial_name(kQuantities[index], i).c_str()))
+                    return failed;
             }
             return 0;
         });
@@ -411,16 +437,21 @@ int polySAR::readhdr(const char* file) {
 int polySAR::clone(polySAR* to) const {
     quo::CallFrame frame{"polySAR::clone", kSource};
     if (to == this) return frame.success();
-    if (const int status = to->CreatePolys(ndc, nfr, nsl2gr, ngr2sl, nsl2theta, nsl2phi))
+    std::int32_t counts[std::size(kQuantities)];
+    each_list(*this, [&](std::size_t index, const auto& list, std::int32_t count) {
+        counts[index] = quo::PolynomialLists::held(*this, index, list.get(), count);
+        return QUO_OK;
+    });
+    if (const int status = to->CreatePolys(counts[0], counts[1], counts[2], counts[3], counts[4], counts[5]))
         return frame.callee(status);
     const auto copy = [](const auto& from, auto& target, int count) {
         for (int i = 0; i < count; ++i) from[i].clone(&target[i]);
     };
-    copy(DC, to->DC, ndc);
-    copy(FR, to->FR, nfr);
-    copy(SL2GR, to->SL2GR, nsl2gr);
-    copy(GR2SL, to->GR2SL, ngr2sl);
-    copy(SL2THETA, to->SL2THETA, nsl2theta);
-    copy(SL2PHI, to->SL2PHI, nsl2phi);
+    copy(DC, to->DC, to->ndc);
+    copy(FR, to->FR, to->nfr);
+    copy(SL2GR, to->SL2GR, to->nsl2gr);
+    copy(GR2SL, to->GR2SL, to->ngr2sl);
+    copy(SL2THETA, to->SL2THETA, to->nsl2theta);
+    copy(SL2PHI, to->SL2PHI, to->nsl2phi);
     return frame.success();
 }

@@ -5,6 +5,7 @@
 #include <cstddef>
 #include <limits>
 #include <new>
+#include <optional>
 #include <utility>
 
 #include "diagnosticslib/call_frame.h"
@@ -20,6 +21,7 @@ constexpr const char* kSource = "generalSARorbit";
 constexpr const char* kTooFew = "You must provide at least 5 state vectors!";
 constexpr const char* kNoModel = "There are no state vectors, or no model through them";
 constexpr const char* kBadArgument = "An argument is null or not finite";
+constexpr const char* kBadTimes = "The times of the state vectors are not finite or do not increase";
 constexpr const char* kNoMemory = "Memory allocation failure";
 
 using Obj = GeneralSAROrbit;
@@ -40,13 +42,57 @@ bool lists_too_few(const char* file) noexcept {
            count < quo::OrbitModel::kRunVectors;
 }
 
-/** Intervals of re-sampled vectors; 0 for more than can be counted. */
+/** Intervals of re-sampled vectors; 0 for more vectors than are made. */
 std::int32_t intervals_for(double length, double spacing) noexcept {
     constexpr double kLeast = quo::OrbitModel::kRunVectors - 1;
-    constexpr std::int32_t kMost = std::numeric_limits<std::int32_t>::max() / 3 - 1;
     // A length that is a multiple of the spacing but for rounding keeps the spacing.
     const double wanted = std::max(kLeast, std::ceil(length / spacing * (1.0 - 1e-12)));
-    return wanted <= kMost ? static_cast<std::int32_t>(wanted) : 0;
+    return wanted < Obj::kMostResampled ? static_cast<std::int32_t>(wanted) : 0;
+}
+
+/** Places of vectors that stand at times of their own, s, in mean spacings after the first; empty where the times
+ * are not finite or do not increase. Throws std::bad_alloc. */
+std::vector<double> places_of(const double* times, std::int32_t count, double spacing) {
+    std::vector<double> places(static_cast<std::size_t>(count));
+    for (std::size_t i = 0; i < places.size(); ++i) {
+        places[i] = (times[i] - times[0]) / spacing;
+        if (!std::isfinite(places[i]) || (i > 0 && !(places[i] > places[i - 1]))) return {};
+    }
+    return places;
+}
+
+/** The first finding that says that the vectors are not one spacing apart. Throws std::bad_alloc. */
+std::optional<SVFinding> first_uneven(const quo::StateVectors& states, double t0) {
+    const auto findings = quo::check_state_vectors(states, t0);
+    const auto found = std::ranges::find_if(findings, quo::is_uneven);
+    return found == findings.end() ? std::nullopt : std::optional{*found};
+}
+
+/** Vectors made from others, with the model through them. */
+struct Resampled {
+    std::unique_ptr<double[]> positions, velocities;
+    std::unique_ptr<quo::OrbitModel> model;
+};
+
+/** Fills `made` with vectors over the span of `old`, in so many intervals. 0, 7, or the status of the model's
+ * build(). */
+int make_resampled(const quo::StateVectors& old, double t0, std::int32_t intervals, Resampled& made) noexcept {
+    const auto values = 3 * (static_cast<std::size_t>(intervals) + 1);
+    made.positions.reset(new (std::nothrow) double[values]);
+    made.velocities.reset(new (std::nothrow) double[values]);
+    made.model = quo::OrbitModel::create(intervals + 1);
+    if (!made.positions || !made.velocities || !made.model) return QUO_NO_MEMORY;
+    const double last = old.place(old.count - 1);
+    const quo::StateInterpolation interpolation{old};
+    for (std::int32_t i = 0; i <= intervals; ++i) {
+        const std::size_t at = 3 * static_cast<std::size_t>(i);
+        interpolation.at(static_cast<double>(i) / intervals * last, &made.positions[at], &made.velocities[at]);
+    }
+    const double length = last * old.spacing_s;
+    const int status =
+        made.model->build({made.positions.get(), made.velocities.get(), intervals + 1, length / intervals}, t0);
+    made.model->note_resampling(interpolation.error_m());
+    return status;
 }
 
 }  // namespace
@@ -62,23 +108,29 @@ void Obj::refreshParameters() { kTable.register_all(*this); }
 int Obj::createBuffers() {
     quo::CallFrame frame{"GeneralSAROrbit::createBuffers", kSource};
     model_.reset();
+    vectors_ = 0;
     buffer_status_ = quo::create_state_vectors(*this);
     if (buffer_status_ == QUO_OK && nSV_n >= quo::OrbitModel::kRunVectors) {
         model_ = quo::OrbitModel::create(nSV_n);
         if (!model_) buffer_status_ = QUO_NO_MEMORY;
     }
-    if (buffer_status_ == QUO_OK) return frame.success();
+    if (buffer_status_ == QUO_OK) {
+        vectors_ = nSV_n;
+        return frame.success();
+    }
     Obj::destroyBuffers();
     return frame.fail(buffer_status_, quo::buffer_message(buffer_status_));
 }
 
 int Obj::destroyBuffers() {
     model_.reset();
+    vectors_ = 0;
     return kTable.destroy_buffers(*this);
 }
 
 int Obj::writehdr(const char* file) {
     quo::CallFrame frame{"GeneralSAROrbit::writehdr", kSource};
+    nSV_n = std::min(nSV_n, vectors_);
     if (const int status = writeAuxiliaryFile(file, 1, kTable.section())) return frame.callee(status);
     return frame.success();
 }
@@ -97,6 +149,7 @@ int Obj::clone(GeneralSAROrbit* other) noexcept {
     quo::CallFrame frame{"GeneralSAROrbit::clone", kSource};
     if (!other) return frame.fail(QUO_REFUSED, kBadArgument);
     if (other == this) return frame.success();
+    nSV_n = std::min(nSV_n, vectors_);
     if (const int status = kTable.copy(*this, *other)) return frame.callee(status);
     if (model_ && other->model_ && model_->vectors() == other->model_->vectors()) other->model_->copy(*model_);
     other->lambda_ = lambda_;
@@ -139,43 +192,49 @@ int Obj::computeApproximateSV() noexcept {
     quo::CallFrame frame{"GeneralSAROrbit::computeApproximateSV", kSource};
     if (model_) model_->drop();
     if (!model_ || model_->vectors() != nSV_n) return frame.fail(QUO_REFUSED, kTooFew);
-    if (!quo::OrbitModel::valid_times(t0SV_s, dtSV_s, nSV_n))
-        return frame.fail(QUO_REFUSED, "The times of the state vectors are not finite or do not increase");
+    if (!quo::OrbitModel::valid_times(t0SV_s, dtSV_s, nSV_n)) return frame.fail(QUO_REFUSED, kBadTimes);
     if (const int status = model_->build(states_of(*this), t0SV_s)) return frame.callee(status);
     return frame.success();
 }
 
-int Obj::SVResample(double spacing) noexcept {
+int Obj::SVResample(double spacing) noexcept { return SVResample(spacing, nullptr); }
+
+int Obj::SVResample(double spacing, const double* times) noexcept {
     quo::CallFrame frame{"GeneralSAROrbit::SVResample", kSource};
-    if (!modelReady() || model_->vectors() != nSV_n) return frame.fail(QUO_REFUSED, kNoModel);
+    const bool enough = nSV_n >= quo::OrbitModel::kRunVectors && nSV_n == vectors_;
+    if (!enough || (!times && !modelReady())) return frame.fail(QUO_REFUSED, kNoModel);
     if (!(spacing > 0.0 && std::isfinite(spacing))) return frame.fail(QUO_REFUSED, "The spacing is not positive");
-    const double length = model_->length();
+    const double length = times ? times[nSV_n - 1] - times[0] : model_->length();
+    const double t0 = times ? t0SV_s + times[0] : model_->first_time();
+    if (!quo::OrbitModel::valid_times(t0, length, 2)) return frame.fail(QUO_REFUSED, kBadTimes);
     const std::int32_t intervals = intervals_for(length, spacing);
-    if (intervals == 0) return frame.fail(QUO_REFUSED, "The spacing is too small for the orbit's length");
+    if (intervals == 0) return frame.fail(QUO_REFUSED, "That would make more than 1000000 state vectors");
 
-    const auto values = 3 * (static_cast<std::size_t>(intervals) + 1);
-    std::unique_ptr<double[]> positions{new (std::nothrow) double[values]};
-    std::unique_ptr<double[]> velocities{new (std::nothrow) double[values]};
-    std::unique_ptr<quo::OrbitModel> model = quo::OrbitModel::create(intervals + 1);
-    if (!positions || !velocities || !model) return frame.fail(QUO_NO_MEMORY, kNoMemory);
-
-    const quo::StateVectors old{pSV_m, vSV_mOs, nSV_n, model_->spacing()};
-    const quo::StateVectors fresh{positions.get(), velocities.get(), intervals + 1, length / intervals};
-    const quo::StateInterpolation interpolation{old};
-    for (std::int32_t i = 0; i <= intervals; ++i) {
-        const std::size_t at = 3 * static_cast<std::size_t>(i);
-        interpolation.at(static_cast<double>(i) / intervals * (old.count - 1), &positions[at], &velocities[at]);
+    quo::StateVectors old{pSV_m, vSV_mOs, nSV_n, length / (nSV_n - 1)};
+    std::vector<double> places;
+    Resampled made;
+    try {
+        if (times) {
+            places = places_of(times, nSV_n, old.spacing_s);
+            if (places.empty()) return frame.fail(QUO_REFUSED, kBadTimes);
+            old.places = places.data();
+        } else if (const auto finding = first_uneven(old, t0)) {
+            return frame.fail(QUO_REFUSED, finding->text);
+        }
+    } catch (const std::bad_alloc&) {
+        return frame.fail(QUO_NO_MEMORY, kNoMemory);
     }
-    if (const int status = model->build(fresh, model_->first_time())) return frame.callee(status);
+    if (const int status = make_resampled(old, t0, intervals, made))
+        return status == QUO_NO_MEMORY ? frame.fail(status, kNoMemory) : frame.callee(status);
 
-    delete[] pSV_m;
-    delete[] vSV_mOs;
-    pSV_m = positions.release();
-    vSV_mOs = velocities.release();
-    t0SV_s = model->first_time();
-    dtSV_s = fresh.spacing_s;
-    nSV_n = fresh.count;
-    model_ = std::move(model);
+    const double before_m = modelReady() ? model_->resampling_error_m() : 0.0;
+    made.model->note_resampling(before_m + made.model->resampling_error_m());
+    delete[] std::exchange(pSV_m, made.positions.release());
+    delete[] std::exchange(vSV_mOs, made.velocities.release());
+    model_ = std::move(made.model);
+    t0SV_s = model_->first_time();
+    dtSV_s = model_->spacing();
+    nSV_n = vectors_ = model_->vectors();
     refreshParameters();
     return frame.success();
 }
@@ -187,7 +246,7 @@ double Obj::orbitFitError() const noexcept {
         (void)frame.fail(QUO_REFUSED, kNoModel);
         return error_m;
     }
-    error_m = quo::run_error_m(states_of(*this));
+    error_m = quo::run_error_m(states_of(*this)) + model_->resampling_error_m();
     (void)frame.success();
     return error_m;
 }
@@ -196,7 +255,7 @@ int Obj::SVCheck(std::vector<SVFinding>& findings) const noexcept {
     quo::CallFrame frame{"GeneralSAROrbit::SVCheck", kSource};
     try {
         quo::StateVectors states = states_of(*this);
-        if (!pSV_m || !vSV_mOs) states.count = 0;
+        states.count = std::min(nSV_n, vectors_);
         findings = quo::check_state_vectors(states, t0SV_s);
     } catch (const std::bad_alloc&) {
         return frame.fail(QUO_NO_MEMORY, kNoMemory);

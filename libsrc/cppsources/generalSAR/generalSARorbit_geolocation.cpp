@@ -28,33 +28,44 @@ using Obj = GeneralSAROrbit;
 
 bool finite_point(const double xyz[3]) noexcept { return xyz && std::isfinite(xyz[0] + xyz[1] + xyz[2]); }
 
-/** What the point solvers need besides the point. */
-struct Radar {
-    double lambda_m, fd_hz;
-    [[nodiscard]] double range_rate() const noexcept { return 0.5 * lambda_m * fd_hz; }
-};
-
 /** The first guess's two solutions lie to either side of the place abeam; which is right depends on the Doppler's
  * sign, the guess takes the one further along the signed flight direction. Newton's method mostly mends a wrong
  * choice within the run. */
 constexpr double kFirstRoot = 1.0, kOtherRoot = -1.0;
 
-/** When the point is seen: on the run that the first guess lands in, else from the other guess through the whole
- * orbit, else from the nearest state vector. 0 or 12. */
-int find_times(quo::OrbitModel& model, const quo::Vec3& point, const Radar& radar, bool precise, double* t,
-               double* range_s) noexcept {
-    const double lambda = radar.lambda_m, fd = radar.fd_hz, rate = radar.range_rate();
+/** On longer arcs straight flight is no guess, and already on shorter ones the coarse curve is none: it leads to
+ * the far side of the Earth, where the equations have a solution, too. */
+constexpr double kLongArc_rad = 5.0, kLongCoarseArc_rad = 3.0;
+
+/** When the point is seen where the first guess does not lead there: from the other guess through the whole orbit,
+ * from the nearest state vector, or wherever the Doppler equation changes sign. 0 or 12. */
+int search_times(const quo::OrbitModel& model, const quo::Target& target, quo::PointTimes* found) noexcept {
     quo::PointTimes guess{};
-    if (!model.long_arc()) {
-        const bool at_hand = !precise && model.guess_on_current(point, rate, kFirstRoot, &guess.since_first_s);
-        if (at_hand || model.linear_guess(point, rate, kFirstRoot, &guess)) {
-            if (precise) guess.since_first_s = model.coarse_guess(point, lambda, fd);
-            if (model.solve_near(guess.since_first_s, point, lambda, fd, t, range_s) == QUO_OK) return QUO_OK;
-            if (fd != 0.0) model.linear_guess(point, rate, kOtherRoot, &guess);
-            if (model.solve_anywhere(guess.since_first_s, point, lambda, fd, t, range_s) == QUO_OK) return QUO_OK;
+    if (model.arc_rad() <= kLongArc_rad && target.fd_hz != 0.0 &&
+        model.linear_guess(target.point, target.range_rate_m_s(), kOtherRoot, &guess) &&
+        model.solve_anywhere(guess.since_first_s, target, found) == QUO_OK)
+        return QUO_OK;
+    if (model.solve_anywhere(model.nearest_start(target.point), target, found) == QUO_OK) return QUO_OK;
+    return model.search_all(target, found);
+}
+
+/** When the point is seen: on the run that the first guess lands in, else by a search. 0 or 12. */
+int find_times(quo::OrbitModel& model, const quo::Target& target, bool precise, double* t,
+               double* range_s) noexcept {
+    const double rate = target.range_rate_m_s();
+    quo::PointTimes guess{};
+    if (model.arc_rad() <= (precise ? kLongCoarseArc_rad : kLongArc_rad)) {
+        const bool at_hand =
+            !precise && model.guess_on_current(target.point, rate, kFirstRoot, &guess.since_first_s);
+        if (at_hand || model.linear_guess(target.point, rate, kFirstRoot, &guess)) {
+            if (precise) guess.since_first_s = model.coarse_guess(target);
+            if (model.solve_near(guess.since_first_s, target, t, range_s) == QUO_OK) return QUO_OK;
         }
     }
-    return model.solve_anywhere(model.nearest_start(point), point, lambda, fd, t, range_s);
+    quo::PointTimes found{};
+    if (const int status = search_times(model, target, &found)) return status;
+    model.settle(found, target, t, range_s);
+    return QUO_OK;
 }
 
 /** Where a line from S along a unit vector first meets the ellipsoid, as a distance; not-a-number where it passes
@@ -162,12 +173,11 @@ int Obj::earth2satLinear(const double xyz[3], double* t, double* rangeTime) noex
 int Obj::earth2satLinear(const double xyz[3], double* t, double* rangeTime, double doppler) noexcept {
     quo::CallFrame frame{"GeneralSAROrbit::earth2satLinear", kSource};
     if (!modelReady()) return frame.fail(QUO_REFUSED, kNoModel);
-    const Radar radar{lambda_, doppler};
-    if (!t || !rangeTime || !finite_point(xyz) || !std::isfinite(radar.range_rate()))
+    const double rate = 0.5 * lambda_ * doppler;
+    if (!t || !rangeTime || !finite_point(xyz) || !std::isfinite(rate))
         return frame.fail(QUO_REFUSED, kBadArgument);
     quo::PointTimes guess{};
-    if (!model_->linear_guess(quo::load(xyz), radar.range_rate(), kFirstRoot, &guess))
-        return frame.callee(QUO_NOT_SEEN);
+    if (!model_->linear_guess(quo::load(xyz), rate, kFirstRoot, &guess)) return frame.callee(QUO_NOT_SEEN);
     *t = model_->first_time() + guess.since_first_s;
     *rangeTime = guess.range_s;
     return frame.success();
@@ -180,10 +190,10 @@ int Obj::locate(quo::CallFrame& frame, const double xyz[3], double doppler, bool
         *t = *rangeTime = -1.0;
         return frame.fail(QUO_REFUSED, kNoModel);
     }
-    const Radar radar{lambda_, doppler};
-    if (!finite_point(xyz) || !std::isfinite(radar.range_rate())) return frame.fail(QUO_REFUSED, kBadArgument);
-    if (const int status = find_times(*model_, quo::load(xyz), radar, precise, t, rangeTime))
-        return frame.callee(status);
+    if (!finite_point(xyz) || !std::isfinite(0.5 * lambda_ * doppler))
+        return frame.fail(QUO_REFUSED, kBadArgument);
+    const quo::Target target{quo::load(xyz), lambda_, doppler};
+    if (const int status = find_times(*model_, target, precise, t, rangeTime)) return frame.callee(status);
     return frame.success();
 }
 

@@ -53,6 +53,7 @@ void Obj::drop_polynomials() noexcept {
 
 int Obj::writehdr(const char* file) {
     quo::CallFrame frame{"SAROrbitStateVectors_Obj::writehdr", kSource};
+    nSV_n = std::min(nSV_n, vectors_);
     if (const int status = writeAuxiliaryFile(file, 1, kTable.section())) return frame.callee(status);
     return frame.success();
 }
@@ -124,6 +125,7 @@ int Obj::clone(SAROrbitStateVectors_Obj* other) noexcept {
     quo::CallFrame frame{"SAROrbitStateVectors_Obj::clone", kSource};
     if (!other) return frame.fail(QUO_REFUSED, kBadArgument);
     if (other == this) return frame.success();
+    nSV_n = std::min(nSV_n, vectors_);
     if (const int status = kTable.copy(*this, *other)) return frame.callee(status);
     other->LookDirection = LookDirection;
     other->fitted_ = fitted_ && other->vectors_ == vectors_;

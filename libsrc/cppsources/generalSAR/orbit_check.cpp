@@ -4,6 +4,7 @@
 #include <array>
 #include <cmath>
 #include <cstdlib>
+#include <numeric>
 #include <utility>
 
 #include "sarutillib/bounded_text.h"
@@ -20,6 +21,8 @@ constexpr double kDuplicateStep = 1e-3;
 constexpr double kPositionNoise_m = 2e-3, kVelocityNoise_m_s = 2e-4;
 // A velocity that is off by so little moves a point by centimetres.
 constexpr double kVelocityTolerance_m_s = 1e-3;
+// A step so near to a whole number of spacings is one.
+constexpr double kNearlyWhole = 0.2;
 // A vector is compared with the curve through so many neighbours, which lie at most so far away.
 constexpr std::size_t kNeighbours = 4;
 constexpr std::int32_t kReach = 6;
@@ -40,8 +43,10 @@ constexpr Wording kWordings[] = {
     {SVFinding::kDuplicate, "stands where its predecessor stands, within", "m"},
     {SVFinding::kPositionStep, "the position is off the curve through its neighbours by", "m"},
     {SVFinding::kVelocity, "the velocity differs from the derivative of the positions by", "m/s"},
+    {SVFinding::kGap, "comes after a gap of", "missing vectors"},
+    {SVFinding::kOrder, "lies behind its predecessor by", "spacings"},
 };
-static_assert(kWordings[SVFinding::kVelocity].problem == SVFinding::kVelocity);
+static_assert(kWordings[SVFinding::kOrder].problem == SVFinding::kOrder);
 
 SVFinding make_finding(SVFinding::Problem problem, std::int32_t index, double size) noexcept {
     const Wording& wording = kWordings[problem];
@@ -58,6 +63,16 @@ SVFinding make_finding(SVFinding::Problem problem, std::int32_t index, double si
     return finding;
 }
 
+/** Time of flight from one vector to another, s, along the circle that the turn of the velocity belongs to; below 0
+ * against the velocities, and not a number where they stand still. */
+double flight_s(const StateVectors& states, std::int32_t from, std::int32_t to) noexcept {
+    const Vec3 chord = position_of(states, to) - position_of(states, from);
+    const Vec3 v0 = velocity_of(states, from), v1 = velocity_of(states, to);
+    const double half_turn = 0.5 * angle_deg(v0, v1) / kDegPerRad;
+    const double arc = norm(chord) * (half_turn > 1e-9 ? half_turn / std::sin(half_turn) : 1.0);
+    return std::copysign(arc, dot(chord, v0 + v1)) / (0.5 * (norm(v0) + norm(v1)));
+}
+
 /** How far a vector lies from the curve through its neighbours, and how much of that is to be expected. */
 struct Deviation {
     double position_m = 0.0, velocity_m_s = 0.0;
@@ -68,21 +83,30 @@ struct Deviation {
 class Examination {
 public:
     explicit Examination(const StateVectors& states)
-        : states_{states}, usable_(static_cast<std::size_t>(std::max(states.count, 0)), true) {}
+        : states_{states},
+          usable_(static_cast<std::size_t>(std::max(states.count, 0)), true),
+          places_(usable_.size()) {
+        std::iota(places_.begin(), places_.end(), 0.0);
+        states_.places = places_.data();
+    }
 
     std::vector<SVFinding> findings(double t0) {
         if (states_.count < kLeastVectors) add(SVFinding::kTooFew, -1, states_.count);
         const bool times_ok = std::isfinite(t0) && std::isfinite(states_.spacing_s) && states_.spacing_s > 0.0;
         if (!times_ok) add(SVFinding::kTimes, -1, states_.spacing_s);
         for (std::int32_t i = 0; i < states_.count; ++i) examine_alone(i);
+        if (states_.count >= kLeastVectors) examine_order();
         if (times_ok && states_.count >= kLeastVectors) examine_together();
         std::ranges::stable_sort(findings_, {}, &SVFinding::index);
         return std::move(findings_);
     }
 
 private:
-    void add(SVFinding::Problem problem, std::int32_t index, double size) {
+    void note(SVFinding::Problem problem, std::int32_t index, double size) {
         findings_.push_back(make_finding(problem, index, size));
+    }
+    void add(SVFinding::Problem problem, std::int32_t index, double size) {
+        note(problem, index, size);
         if (index >= 0) usable_[static_cast<std::size_t>(index)] = false;
     }
     [[nodiscard]] bool usable(std::int32_t i) const { return usable_[static_cast<std::size_t>(i)]; }
@@ -95,6 +119,63 @@ private:
         const double step = norm(position - position_of(states_, i - 1));
         if (step <= kDuplicateStep * std::abs(states_.spacing_s) * norm(velocity))
             add(SVFinding::kDuplicate, i, step);
+    }
+
+    /** The way from one vector to the next, and by how much it is longer than their numbers say. */
+    struct Step {
+        std::int32_t from, to;
+        double spacings;
+
+        [[nodiscard]] bool whole() const { return std::abs(spacings - std::round(spacings)) < kNearlyWhole; }
+        [[nodiscard]] double missing() const {
+            return (whole() ? std::round(spacings) : spacings) - (to - from);
+        }
+    };
+
+    /** All steps, counted in the one that most of the list takes, whatever the unit of its velocities. */
+    [[nodiscard]] std::vector<Step> steps() const {
+        std::vector<Step> all;
+        std::vector<double> singles_s;
+        std::int32_t from = -1;
+        for (std::int32_t i = 0; i < states_.count; ++i) {
+            if (!usable(i)) continue;
+            const double time_s = from < 0 ? 0.0 : flight_s(states_, from, i);
+            if (from >= 0 && std::isfinite(time_s)) {
+                all.push_back({from, i, time_s});
+                singles_s.push_back(std::abs(time_s) / (i - from));
+            }
+            from = i;
+        }
+        if (all.empty()) return all;
+        const auto middle = singles_s.begin() + static_cast<std::ptrdiff_t>((singles_s.size() - 1) / 2);
+        std::ranges::nth_element(singles_s, middle);
+        if (!(*middle > 0.0)) return {};
+        for (Step& step : all) step.spacings /= *middle;
+        return all;
+    }
+
+    /** Whether a step tells where its vector stands. A wrong position makes two steps that do not: neither is a
+     * whole number of spacings, and the second makes up for the first. */
+    static bool tells_place(const std::vector<Step>& all, std::size_t i) {
+        if (all[i].whole()) return true;
+        return all[i].spacings > 1.5 && i + 1 < all.size() && std::abs(all[i + 1].spacings - 1.0) < kNearlyWhole;
+    }
+
+    // Where every vector stands, in spacings. Steps ahead make up for steps back: a list that is out of order has
+    // no gaps to be told.
+    void examine_order() {
+        const std::vector<Step> all = steps();
+        const auto back = [](const Step& step) { return step.spacings < -0.5; };
+        const bool ordered = std::ranges::none_of(all, back);
+        double moved = 0.0;  // against the place in the list
+        for (std::size_t i = 0; i < all.size(); ++i) {
+            const Step& step = all[i];
+            const double missing = tells_place(all, i) ? step.missing() : 0.0;
+            moved += missing;
+            places_[static_cast<std::size_t>(step.to)] += moved;
+            if (back(step)) add(SVFinding::kOrder, step.to, -step.spacings);
+            if (ordered && missing >= 0.5) note(SVFinding::kGap, step.to, missing);
+        }
     }
 
     // A wrong vector bends the curves that its neighbours are compared with, too. So first come those without
@@ -156,7 +237,7 @@ private:
         std::array<std::int32_t, kNeighbours> room;
         const auto nodes = neighbours(i, left_out, room);
         if (nodes.size() < kNeighbours) return {};
-        const NodeWeights weights = hermite_weights(nodes, i);
+        const NodeWeights weights = hermite_weights(states_, nodes, states_.place(i));
         double position[3], velocity[3];
         weights.apply(states_, position, velocity);
         Deviation off{norm(load(position) - position_of(states_, i)),
@@ -174,12 +255,15 @@ private:
         const double radius = norm(position_of(states_, i));
         double miss = radius / kFactorial8;
         for (const std::int32_t node : nodes)
-            miss *= std::pow(kRoom * norm(velocity_of(states_, i)) / radius * states_.spacing_s * (i - node), 2.0);
+            miss *= std::pow(kRoom * norm(velocity_of(states_, i)) / radius * states_.spacing_s *
+                                 (states_.place(i) - states_.place(node)),
+                             2.0);
         return miss;
     }
 
     StateVectors states_;
-    std::vector<bool> usable_;  // as a neighbour of others
+    std::vector<bool> usable_;    // as a neighbour of others
+    std::vector<double> places_;  // of the usable ones, as their steps tell
     std::vector<SVFinding> findings_;
 };
 

@@ -53,6 +53,13 @@ struct PointTimes {
     double since_first_s, range_s;
 };
 
+/** What is looked for: a point, and the Doppler that it is to be seen with. */
+struct Target {
+    Vec3 point;
+    double lambda_m, fd_hz;
+    [[nodiscard]] double range_rate_m_s() const noexcept { return 0.5 * lambda_m * fd_hz; }
+};
+
 /** What an orbit model holds beside its runs. */
 struct OrbitModelValues {
     double t0_ = 0.0, dt_ = 0.0;  // first vector and spacing
@@ -62,7 +69,8 @@ struct OrbitModelValues {
     std::int64_t switches_ = 0;
     StraightFlight mean_{};                                 // from the first vector to the last
     double coarse_x_[5]{}, coarse_y_[5]{}, coarse_z_[5]{};  // the whole orbit, in the time since the first vector
-    bool long_arc_ = false;
+    double resampling_m_ = 0.0;  // what the interpolation that made the vectors may have left
+    double arc_rad_ = 0.0;
     bool ready_ = false;
 };
 
@@ -87,6 +95,9 @@ public:
     void copy(const OrbitModel& other) noexcept;
 
     void drop() noexcept { ready_ = false; }
+    /** Notes by how much the vectors themselves may be off since they were interpolated, m. build() forgets it. */
+    void note_resampling(double error_m) noexcept { resampling_m_ = error_m; }
+    [[nodiscard]] double resampling_error_m() const noexcept { return resampling_m_; }
 
     [[nodiscard]] bool ready() const noexcept { return ready_; }
     [[nodiscard]] std::int32_t vectors() const noexcept { return runs_count_ + kRunVectors - 1; }
@@ -118,19 +129,25 @@ public:
         return dt_ <= u && u <= 3.0 * dt_;
     }
     /** Time of a point on the coarse curve since the first vector, for a first guess. */
-    double coarse_guess(const Vec3& point, double lambda_m, double fd_hz) const noexcept;
+    double coarse_guess(const Target& target) const noexcept;
     /** When the point is seen: Newton's method from a first guess, on the current run made to suit it. `t` is on
-     * the absolute scale. 0, or 12 when the solution lies outside that run; nothing is then written. */
-    int solve_near(double guess_since_first_s, const Vec3& point, double lambda_m, double fd_hz, double* t,
-                   double* range_s) noexcept;
-    /** The same over the whole orbit, from run to run, until a run holds its own solution; the current run stays.
-     * A solution up to 1e-4 s beyond the first or the last vector counts as on the orbit. */
-    int solve_anywhere(double guess_since_first_s, const Vec3& point, double lambda_m, double fd_hz, double* t,
-                       double* range_s) const noexcept;
+     * the absolute scale. Where the solution leaves the middle of that run it is found again on the run that
+     * serves there. 0, or 12 when it lies outside the run or the steps ran out; nothing is then written. */
+    int solve_near(double guess_since_first_s, const Target& target, double* t, double* range_s) noexcept;
+    /** Ends a search that found the point's times on some run: solves again on the run that serves that time, so
+     * that the way back to the ground starts from the same curve. Where that one has no solution, as beyond the
+     * ends, the times stay those found. */
+    void settle(const PointTimes& found, const Target& target, double* t, double* range_s) noexcept;
+    /** As solve_near() over the whole orbit, from run to run, until a run holds its own solution; the current run
+     * stays. A solution up to 1e-4 s beyond the first or the last vector counts as on the orbit. */
+    int solve_anywhere(double guess_since_first_s, const Target& target, PointTimes* found) const noexcept;
+    /** Of all times at which the point is seen the one from nearest by, found by the changes of sign that the
+     * Doppler equation makes from vector to vector, also where there are two between two vectors. 0 or 12. */
+    int search_all(const Target& target, PointTimes* found) const noexcept;
     /** Time since the first vector of the run that starts nearest to the point. */
     double nearest_start(const Vec3& point) const noexcept;
-    /** Whether the platform flies so far round the Earth that the linear guess means nothing. */
-    [[nodiscard]] bool long_arc() const noexcept { return long_arc_; }
+    /** How far the platform flies round the Earth, about, as an angle. */
+    [[nodiscard]] double arc_rad() const noexcept { return arc_rad_; }
 
 private:
     OrbitModel(std::unique_ptr<OrbitRun[]> runs, std::int32_t count) noexcept
@@ -139,6 +156,16 @@ private:
     void take(std::int32_t k) noexcept;
     /** The run with the vector nearest to a time in its middle, as far as there is one. `spacings` is finite. */
     [[nodiscard]] std::int32_t centred_run(double spacings) const noexcept;
+    struct Crossing;
+    [[nodiscard]] Crossing crossing_at(double since_first_s, std::int32_t run_number,
+                                       const Target& target) const noexcept;
+    [[nodiscard]] PointTimes crossing_between(Crossing before, Crossing after, std::int32_t run_number,
+                                              const Target& target) const noexcept;
+    [[nodiscard]] Crossing turn_between(Crossing before, Crossing after, std::int32_t run_number,
+                                        const Target& target) const noexcept;
+    struct Nearest;
+    void search_piece(double from_s, double to_s, std::int32_t run_number, const Target& target,
+                      Nearest& nearest) const noexcept;
     int fit_runs(const StateVectors& states) noexcept;
     int fit_whole(const StateVectors& states) noexcept;
 

@@ -252,37 +252,53 @@ struct TimeSpan {
 inline constexpr int kInverseSteps = 8;
 inline constexpr double kInverseStep = 1e-8;
 
+/** How far a state is from seeing P with a range rate of lambda fd / 2, in m^2/s, and the derivative of that by
+ * time. With D = P - S, R = |D| the residual is -V.D + (lambda fd / 2) R; the rotation of the Earth, added to
+ * satellite and target, cancels in it. Its derivative is V.V - A.D - (lambda fd / 2) V.D / R. */
+struct DopplerResidual {
+    double value, slope, range2_m2;
+};
+inline DopplerResidual doppler_residual(const OrbitState& s, const Vec3& P, double range_rate_m_s) noexcept {
+    const Vec3 line = P - s.position;
+    const double range2 = dot(line, line);
+    double value = -dot(s.velocity, line);
+    double slope = dot(s.velocity, s.velocity) - dot(s.acceleration, line);
+    if (range_rate_m_s != 0.0) {  // the root stays out of the loop where the Doppler is zero
+        const double range = std::sqrt(range2);
+        slope += range_rate_m_s * value / range;
+        value += range_rate_m_s * range;
+    }
+    return {value, slope, range2};
+}
+
+/** When a point is seen: time on a segment and two-way range time before the last step, and whether that step was
+ * shorter than kInverseStep. */
+struct ImageTime {
+    double t_s, tau_s;
+    bool settled;
+};
+
 /** Time at which P is seen with Doppler fd, by Newton's method from `start_s`, and the range time before the last
- * step. 12 when an iterate but the last leaves the span or anything is not a number.
+ * step. 12 when an iterate but the last leaves the span or anything is not a number. Running out of steps is told in
+ * the result alone.
  *
  * Targets seen close to either end need room beyond it: from the middle of a segment of 10 s spacing the first
- * iterate lands up to 0.1 s beside a solution at the end, at 60 s spacing up to 3 s.
- *
- * The residual is -V.D + (lambda fd / 2) R with D = P - S, R = |D|; the rotation of the Earth, added to satellite
- * and target, cancels in it. Its derivative is V.V - A.D - (lambda fd / 2) V.D / R. */
+ * iterate lands up to 0.1 s beside a solution at the end, at 60 s spacing up to 3 s. */
 inline int image_time(const OrbitSegment& orbit, const Vec3& P, double start_s, const TimeSpan& span,
-                      double lambda_m, double fd_hz, double* t_s, double* tau_s) noexcept {
-    const double squint = 0.5 * lambda_m * fd_hz;
+                      double lambda_m, double fd_hz, ImageTime* seen) noexcept {
+    const double range_rate = 0.5 * lambda_m * fd_hz;
     double t = start_s, range2 = 0.0;
-    for (int step = 0; step < kInverseSteps; ++step) {
+    bool settled = false;
+    for (int step = 0; step < kInverseSteps && !settled; ++step) {
         if (!(t >= span.first_s && t <= span.last_s)) return QUO_NOT_SEEN;
-        const OrbitState s = orbit_state(orbit, t);
-        const Vec3 line = P - s.position;
-        range2 = dot(line, line);
-        double residual = -dot(s.velocity, line);
-        double slope = dot(s.velocity, s.velocity) - dot(s.acceleration, line);
-        if (squint != 0.0) {  // the root stays out of the loop where the Doppler is zero
-            const double range = std::sqrt(range2);
-            slope += squint * residual / range;
-            residual += squint * range;
-        }
-        const double change = residual / slope;
+        const DopplerResidual at = doppler_residual(orbit_state(orbit, t), P, range_rate);
+        const double change = at.value / at.slope;
         t -= change;
-        if (std::abs(change) < kInverseStep) break;
+        range2 = at.range2_m2;
+        settled = std::abs(change) < kInverseStep;
     }
     if (!std::isfinite(t)) return QUO_NOT_SEEN;
-    *t_s = t;
-    *tau_s = 2.0 / kLightSpeed * std::sqrt(range2);
+    *seen = {t, 2.0 / kLightSpeed * std::sqrt(range2), settled};
     return QUO_OK;
 }
 
