@@ -14,6 +14,7 @@
 #include <utility>
 
 #include "quo_base/api.h"
+#include "sarutillib/bounded_text.h"
 #include "sarutillib/file_io.h"
 #include "sarutillib/number_text.h"
 
@@ -35,7 +36,9 @@ class XmlErrors {
 public:
     XmlErrors() noexcept : handler_{xmlStructuredError}, context_{xmlStructuredErrorContext} {
         xmlSetStructuredErrorFunc(this, [](void* self, xmlError* error) {
-            if (error->code == XML_ERR_NO_MEMORY) static_cast<XmlErrors*>(self)->out_of_memory_ = true;
+            auto& errors = *static_cast<XmlErrors*>(self);
+            if (error->code == XML_ERR_NO_MEMORY) errors.out_of_memory_ = true;
+            if (errors.line_ == 0) errors.note(*error);
         });
     }
     ~XmlErrors() { xmlSetStructuredErrorFunc(context_, handler_); }
@@ -43,11 +46,23 @@ public:
     XmlErrors& operator=(const XmlErrors&) = delete;
 
     [[nodiscard]] bool out_of_memory() const noexcept { return out_of_memory_; }
+    /** The first error, "line 17: ..."; empty where there was none. */
+    [[nodiscard]] std::string first() const {
+        return line_ > 0 ? "line " + std::to_string(line_) + ": " + message_ : "";
+    }
 
 private:
+    void note(const xmlError& error) noexcept {
+        const std::string_view text = error.message ? error.message : "";
+        copy_bounded(message_, text.substr(0, text.find('\n')));
+        line_ = error.line;
+    }
+
     xmlStructuredErrorFunc handler_;
     void* context_;
     bool out_of_memory_ = false;
+    int line_ = 0;
+    char message_[256] = "";
 };
 
 // --- reading ----------------------------------------------------------------------------------------------------
@@ -90,13 +105,15 @@ std::unique_ptr<xmlParserCtxt, decltype(&xmlFreeParserCtxt)> make_parser() {
 
 constexpr int kOptions = XML_PARSE_NOBLANKS | XML_PARSE_COMPACT | XML_PARSE_NONET;
 
-/** Parses with `read(parser)`. 0, 1 for what is no XML that we accept, or 7. */
+/** Parses with `read(parser)`. 0, 1 for what is no XML that we accept, with the reason in `defect` where that is
+ * asked for, or 7. */
 template <typename Read>
-int parse(XmlTree& tree, Read read) {
+int parse(XmlTree& tree, Read read, std::string* defect = nullptr) {
     const XmlErrors errors;
     const auto parser = make_parser();
     if (!parser) return QUO_NO_MEMORY;
     tree.reset(read(parser.get()));
+    if (defect) *defect = errors.first();
     // A text that is too long counts as a lack of memory too; what fails without an error never got to parse.
     const bool unexplained = !tree && parser->errNo == XML_ERR_OK;
     if (errors.out_of_memory() || unexplained) return QUO_NO_MEMORY;
@@ -114,13 +131,14 @@ int open_source(const char* file, Source& source) {
 
 }  // namespace
 
-int HeaderDocument::load(const char* file, std::shared_ptr<HeaderDocument>& document) {
+int HeaderDocument::load(const char* file, std::shared_ptr<HeaderDocument>& document, std::string* defect) {
     Source source;
     if (const int status = open_source(file, source)) return status;
     XmlTree tree;
-    const int status = parse(tree, [&](xmlParserCtxt* parser) {
+    const auto read = [&](xmlParserCtxt* parser) {
         return xmlCtxtReadIO(parser, read_source, nullptr, &source, nullptr, nullptr, kOptions);
-    });
+    };
+    const int status = parse(tree, read, defect);
     if (source.too_long) return QUO_NO_MEMORY;
     if (status != QUO_OK) return status;
     document = std::make_shared<HeaderDocument>(tree.get(), source.bytes);

@@ -54,8 +54,9 @@ private:
 class HeaderDocument {
 public:
     /** Parses a header file. 0; 1 when there is none or it is no XML that we accept (see quorelxml_v2.h); 7 when
-     * it does not fit into memory: then nothing may take its place. */
-    static int load(const char* file, std::shared_ptr<HeaderDocument>& document);
+     * it does not fit into memory: then nothing may take its place. `defect`, where it is given, tells what is no
+     * XML and on which line; empty where it all is. */
+    static int load(const char* file, std::shared_ptr<HeaderDocument>& document, std::string* defect = nullptr);
     /** A fresh document, or null when memory is short. */
     static std::shared_ptr<HeaderDocument> create();
 

@@ -127,8 +127,9 @@ int quorelxml::parse() noexcept {
     CallFrame frame{"quorelxml::parse", kSource};
     return guarded(frame, [&] {
         document_.reset();
+        defect_.clear();
         irreplaceable_ = true;  // also when the next line throws
-        const int status = HeaderDocument::load(file_name_.c_str(), document_);
+        const int status = HeaderDocument::load(file_name_.c_str(), document_, &defect_);
         CallFrame::drop_errno();  // a missing file is no error here
         irreplaceable_ = status == QUO_NO_MEMORY;
         if (irreplaceable_) return frame.fail(status, "Header file does not fit into memory");
