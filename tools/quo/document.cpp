@@ -1,6 +1,7 @@
 #include "document.h"
 
 #include <filesystem>
+#include <fstream>
 
 #include "failure.h"
 
@@ -12,7 +13,17 @@ Document::Document(const std::string& file) : file_{file} {
     if (kind == std::filesystem::file_type::not_found) throw Failure(file + ": no such file");
     if (kind != std::filesystem::file_type::regular) throw Failure(file + ": not a regular file");
     storeFileName(file.c_str());
-    if (parse() != QUO_OK || !isRecognized()) throw Failure(file + ": is no header document");
+    if (parse() != QUO_OK || !isRecognized())
+        throw Failure(file + ": " + or_xml_defect(file, "is no header document"));
+}
+
+std::string Document::or_xml_defect(const std::string& file, const std::string& cause) {
+    char first = '\0';
+    std::ifstream{file} >> first;  // the first that is no blank
+    Document document;
+    if (first != '<' || document.storeFileName(file.c_str()) != QUO_OK) return cause;
+    (void)document.parse();
+    return document.defect().empty() ? cause : "is no XML, " + document.defect();
 }
 
 bool Document::in(const std::string& file) {
@@ -54,7 +65,7 @@ void Document::replace(const std::string& field, const std::vector<std::string>&
 }
 
 void Document::save() {
-    if (write() != QUO_OK) throw Failure(file_ + ": cannot be written");
+    require_done(file_, "cannot be written", [this] { return write(); });
 }
 
 }  // namespace tool

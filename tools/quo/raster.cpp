@@ -134,13 +134,15 @@ std::int64_t sample_offset(const RasterDescription& raster, std::int64_t line, s
 RasterReader::RasterReader(std::string name, const RasterDescription& description)
     : name_{std::move(name)}, file_{name_.c_str()} {
     file_.copyDescription(description);
-    file_.open(BufferFile::READ);
-    if (!file_.is_open()) throw Failure(name_ + ": cannot be opened");
+    require_done(name_, "cannot be opened", [this] {
+        file_.open(BufferFile::READ);
+        return file_.is_open() ? QUO_OK : QUO_NOT_OPENED;
+    });
 }
 
 void RasterReader::fail() const {
     throw_if_interrupted();
-    throw Failure(name_ + ": cannot be read");
+    throw Failure(name_ + ": cannot be read: " + library_cause(QUO_READ_FAILED));
 }
 
 void RasterReader::read_bytes(std::int64_t offset, char* to, std::int64_t bytes) {
@@ -191,8 +193,10 @@ NewRaster::NewRaster(const std::string& name, const RasterDescription& descripti
     }
     file_.copyDescription(description);
     file_.setFilename(unfinished.c_str());
-    file_.open(BufferFile::WRITE);
-    if (!file_.is_open()) throw Failure(name + ": cannot be created");
+    require_done(name, "cannot be created", [this] {
+        file_.open(BufferFile::WRITE);
+        return file_.is_open() ? QUO_OK : QUO_NOT_OPENED;
+    });
     unfinished_ = unfinished;
     unfinished_side_file_ = side_file_ + ending;
 }
@@ -206,7 +210,7 @@ NewRaster::~NewRaster() {
 
 void NewRaster::fail() const {
     throw_if_interrupted();
-    throw Failure(target_ + ": cannot be written, is the disk full?");
+    throw Failure(target_ + ": cannot be written: " + library_cause(QUO_WRITE_FAILED));
 }
 
 void NewRaster::require_length(std::int64_t length) const {
@@ -250,7 +254,8 @@ void NewRaster::write_side_file() {
         !std::filesystem::copy_file(side_file_, unfinished_side_file_, error)) {
         throw Failure(side_file_ + ": " + error.message());
     }
-    if (file_.writehdr(unfinished_side_file_.c_str()) != QUO_OK) throw Failure(side_file_ + ": cannot be written");
+    require_done(side_file_, "cannot be written",
+                 [this] { return file_.writehdr(unfinished_side_file_.c_str()); });
 }
 
 void NewRaster::give_name(std::string& unfinished, const std::string& target) {
