@@ -9,9 +9,11 @@
 #include "commands.h"
 #include "document.h"
 #include "failure.h"
+#include "field_check.h"
 #include "number.h"
 #include "output.h"
 #include "product.h"
+#include "shown.h"
 
 namespace tool {
 namespace {
@@ -43,37 +45,41 @@ int get_field(const FieldOptions& options) {
     require_field(options.field);
     Document document{options.header};
     const std::vector<std::string> values = document.values(options.field);
-    Output output{"-"};
     if (options.json) {
         const bool numeric = is_number(options.field);
         nlohmann::json list = nlohmann::json::array();
         for (const std::string& value : values) list.push_back(as_json(value, numeric));
         const bool single = values.size() == 1 && !document.is_array(options.field);
-        const nlohmann::json about{{"field", options.field}, {"value", single ? list[0] : list}};
-        output.write(about.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n");
+        print_json({{"field", options.field}, {"value", single ? list[0] : list}});
     } else {
-        for (const std::string& value : values) output.write(value + "\n");
+        Output output{"-"};
+        for (const std::string& value : values) output.write(shown(value) + "\n");
+        output.commit();
     }
-    output.commit();
     return kFine;
 }
 
-// "nan" is a number that a header may hold; a word would read back as 0.
-bool can_be_number(const std::string& text) {
-    const bool not_finite = text == "nan" || text == "inf" || text == "-nan" || text == "-inf";
-    return not_finite || finite_number(text).has_value();
+// What would make the field say something that makes no sense. Fields that no object registers may hold anything
+// but, where polynomials and corner points are meant, words.
+std::string defect_of(const FieldOptions& options) {
+    GeneralSAR product;
+    if (const parElement* element = element_at(product, options.field))
+        return values_defect(*element, *element, options.values);
+    if (!is_numeric_field(product, options.field)) return "";
+    for (const std::string& value : options.values)
+        if (!finite_number(value)) return "\"" + value + "\" is no finite number";
+    return "";
 }
 
 int set_field(const FieldOptions& options) {
     require_field(options.field);
-    const bool numeric = is_number(options.field);
     for (const std::string& value : options.values) {
         if (value.size() >= Document::kTextRoom) {
             throw WrongUse("a value of " + std::to_string(value.size()) + " bytes");
         }
-        if (numeric && !can_be_number(value))
-            throw WrongUse(options.field + " is a number, " + value + " is none");
     }
+    const std::string defect = defect_of(options);
+    if (!defect.empty()) throw WrongUse(options.field + ": " + defect);
     Document document{options.header};
     if (!document.has(options.field) && !options.create) {
         throw Failure(options.header + ": has no field " + options.field + " (--create makes it)");
