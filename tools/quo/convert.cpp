@@ -3,6 +3,7 @@
 #include <memory>
 #include <vector>
 
+#include "apart.h"
 #include "commands.h"
 #include "failure.h"
 #include "interrupt.h"
@@ -111,6 +112,7 @@ private:
 };
 
 int convert(const ConvertOptions& options) {
+    require_raster_apart(options.in, options.out);
     DataFile description;
     read_description(options.in, description);
     note_interrupts();

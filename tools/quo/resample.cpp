@@ -6,6 +6,7 @@
 #include <optional>
 #include <vector>
 
+#include "apart.h"
 #include "commands.h"
 #include "failure.h"
 #include "interrupt.h"
@@ -199,6 +200,7 @@ private:
 };
 
 int resample(const ResampleOptions& options) {
+    require_raster_apart(options.in, options.out);
     DataFile description;
     read_description(options.in, description);
     if (description.NrOfLinesPerImage < 1 || description.NrOfPixelsPerLine < 1)
