@@ -69,6 +69,9 @@ public:
     int write() noexcept;
     /** Drops the document; safe to call repeatedly. Returns 0. */
     int clean() noexcept;
+    /** What is no XML in a file, the first place of it: "line 17: ..."; empty where all of it is, or cannot be
+     * read. Throws bad_alloc. */
+    static std::string xmlDefect(const char* file_name);
 
     /** Reads `count` values of a field into the caller's array.
      *
@@ -141,8 +144,6 @@ protected:
     std::int32_t numberOfChannels() const noexcept { return number_of_channels_; }
     /** Whether there is a document in memory. */
     bool loaded() const noexcept { return document_ != nullptr; }
-    /** What parse() found first that is no XML, "line 17: ..."; empty where it all is. */
-    const std::string& defect() const noexcept { return defect_; }
     /** Takes over the name of the file, nothing else. 0; 1 for one that does not fit, with no name left; 7. */
     int storeFileName(const char* file_name) noexcept;
     /** Inserts a processing instruction before the root element, unless something stands there already. */
@@ -159,7 +160,7 @@ private:
     void printMissing(int channel, const char* field) const;
 
     std::shared_ptr<quo::HeaderDocument> document_;  // shared with a header session while one is open
-    std::string file_name_, description_, format_, defect_;
+    std::string file_name_, description_, format_;
     std::int32_t number_of_channels_ = 0;
     bool debug_ = false;
     bool irreplaceable_ = false;  // the file does not fit into memory: no fresh document may replace it

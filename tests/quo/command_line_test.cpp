@@ -80,8 +80,9 @@ TEST_P(WrongUse, IsRefusedInOneLineWithStatusTwo) {
     EXPECT_EQ(refused.out, "");
     ASSERT_EQ(refused.messages().size(), 1U) << refused.err;
     EXPECT_THAT(refused.err, StartsWith("quo: "));
-    if (!GetParam().arguments.empty() && GetParam().arguments[0] != "geocode")
-        EXPECT_THAT(refused.err, HasSubstr("(see quo " + GetParam().arguments[0] + " --help)"));
+    const bool no_verb = GetParam().arguments.empty() || GetParam().arguments[0] == "geocode";
+    EXPECT_THAT(refused.err,
+                HasSubstr(no_verb ? "; there are geolocate" : "(see quo " + GetParam().arguments[0] + " --help)"));
 }
 INSTANTIATE_TEST_SUITE_P(CommandLine, WrongUse, testing::ValuesIn(kWrongUses),
                          [](const auto& row) { return row.param.name; });

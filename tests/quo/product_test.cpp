@@ -37,10 +37,10 @@ protected:
         const auto slash = field.find('/');
         const std::string name = field.substr(slash + 1);
         std::string text = test::read_text(header);
-        const std::size_t section = text.find("<" + field.substr(0, slash) + ">");
-        const std::size_t first = text.find("<" + name + ">", section) + name.size() + 2;
-        const std::size_t last = text.find("</" + name + ">", first);
-        ASSERT_NE(last, std::string::npos) << field;
+        const std::size_t section = text.find('<' + field.substr(0, slash) + '>');
+        const std::size_t first = text.find('<' + name + '>', section) + name.size() + 2;
+        const std::size_t last = text.find('/' + name + '>', first) - 1;
+        ASSERT_LT(last, text.size()) << field;
         test::write_text(header, text.replace(first, last - first, value));
     }
     test::TemporaryFolder folder_;

@@ -93,7 +93,7 @@ TEST_F(RasterVerbs, RefusalsNameFileAndCauseAndLeaveNothing) {
         {"BadLines", {"convert", in, "OUT", "--lines", "3:9"}, 2, "no part of 0:4"},
         {"BadType", {"convert", in, "OUT", "--type", "INT99"}, 2, "INT99"},
         {"FolderAsTarget", {"convert", in, folder_.path().string()}, 1, "no regular file"},
-        {"NoSuchFolder", {"convert", in, file("no/out.raw")}, 1, "cannot be created: No such file or directory"},
+        {"NoSuchFolder", {"convert", in, file("no/out.raw")}, 1, "cannot be created"},
         {"Looks", {"quicklook", in, "OUT", "--looks", "0x3"}, 2, "--looks"},
         {"Decibels", {"quicklook", in, "OUT", "--db", "5:1"}, 2, "--db"},
         {"VrtOfNothing", {"vrt", file("none.raw")}, 1, "none.raw"},

@@ -20,10 +20,8 @@ Document::Document(const std::string& file) : file_{file} {
 std::string Document::or_xml_defect(const std::string& file, const std::string& cause) {
     char first = '\0';
     std::ifstream{file} >> first;  // the first that is no blank
-    Document document;
-    if (first != '<' || document.storeFileName(file.c_str()) != QUO_OK) return cause;
-    (void)document.parse();
-    return document.defect().empty() ? cause : "is no XML, " + document.defect();
+    const std::string defect = first == '<' ? xmlDefect(file.c_str()) : "";
+    return defect.empty() ? cause : "is no XML, " + defect;
 }
 
 bool Document::in(const std::string& file) {

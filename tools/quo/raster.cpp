@@ -134,15 +134,13 @@ std::int64_t sample_offset(const RasterDescription& raster, std::int64_t line, s
 RasterReader::RasterReader(std::string name, const RasterDescription& description)
     : name_{std::move(name)}, file_{name_.c_str()} {
     file_.copyDescription(description);
-    require_done(name_, "cannot be opened", [this] {
-        file_.open(BufferFile::READ);
-        return file_.is_open() ? QUO_OK : QUO_NOT_OPENED;
-    });
+    file_.open(BufferFile::READ);
+    if (!file_.is_open()) throw Failure(name_ + ": cannot be opened");
 }
 
 void RasterReader::fail() const {
     throw_if_interrupted();
-    throw Failure(name_ + ": cannot be read: " + library_cause(QUO_READ_FAILED));
+    throw Failure(name_ + ": cannot be read");
 }
 
 void RasterReader::read_bytes(std::int64_t offset, char* to, std::int64_t bytes) {
@@ -193,10 +191,8 @@ NewRaster::NewRaster(const std::string& name, const RasterDescription& descripti
     }
     file_.copyDescription(description);
     file_.setFilename(unfinished.c_str());
-    require_done(name, "cannot be created", [this] {
-        file_.open(BufferFile::WRITE);
-        return file_.is_open() ? QUO_OK : QUO_NOT_OPENED;
-    });
+    file_.open(BufferFile::WRITE);
+    if (!file_.is_open()) throw Failure(name + ": cannot be created");
     unfinished_ = unfinished;
     unfinished_side_file_ = side_file_ + ending;
 }
@@ -210,7 +206,7 @@ NewRaster::~NewRaster() {
 
 void NewRaster::fail() const {
     throw_if_interrupted();
-    throw Failure(target_ + ": cannot be written: " + library_cause(QUO_WRITE_FAILED));
+    throw Failure(target_ + ": cannot be written, is the disk full?");
 }
 
 void NewRaster::require_length(std::int64_t length) const {
@@ -254,8 +250,7 @@ void NewRaster::write_side_file() {
         !std::filesystem::copy_file(side_file_, unfinished_side_file_, error)) {
         throw Failure(side_file_ + ": " + error.message());
     }
-    require_done(side_file_, "cannot be written",
-                 [this] { return file_.writehdr(unfinished_side_file_.c_str()); });
+    if (file_.writehdr(unfinished_side_file_.c_str()) != QUO_OK) throw Failure(side_file_ + ": cannot be written");
 }
 
 void NewRaster::give_name(std::string& unfinished, const std::string& target) {

@@ -127,9 +127,8 @@ int quorelxml::parse() noexcept {
     CallFrame frame{"quorelxml::parse", kSource};
     return guarded(frame, [&] {
         document_.reset();
-        defect_.clear();
         irreplaceable_ = true;  // also when the next line throws
-        const int status = HeaderDocument::load(file_name_.c_str(), document_, &defect_);
+        const int status = HeaderDocument::load(file_name_.c_str(), document_);
         CallFrame::drop_errno();  // a missing file is no error here
         irreplaceable_ = status == QUO_NO_MEMORY;
         if (irreplaceable_) return frame.fail(status, "Header file does not fit into memory");
@@ -226,6 +225,14 @@ int quorelxml::insertInstruction(const char* name, const char* content) noexcept
     CallFrame frame{"quorelxml::insertInstruction", kSource};
     if (!document_) return frame.fail(QUO_REFUSED, "No header document");
     return document_->insert_instruction(name, content) ? frame.success() : out_of_memory(frame);
+}
+
+std::string quorelxml::xmlDefect(const char* file_name) {
+    std::shared_ptr<HeaderDocument> document;
+    std::string defect;
+    (void)HeaderDocument::load(file_name, document, &defect);
+    CallFrame::drop_errno();
+    return defect;
 }
 
 // --- looking up -------------------------------------------------------------------------------------------------
