@@ -15,6 +15,10 @@ if(QUO_SANITIZE)
     target_compile_options(quo_flags INTERFACE ${quo_sanitize} -O1 -g1)
     target_link_options(quo_flags INTERFACE ${quo_sanitize})
 endif()
+if(QUO_BUILD_FUZZ)
+    # Every component tells the fuzzer which of its branches ran: without that it only tries inputs at random.
+    target_compile_options(quo_flags INTERFACE -fsanitize=fuzzer-no-link)
+endif()
 
 # quo_component(name SOURCES ... [DEPENDS component ...] [LINK library ...])
 function(quo_component name)
@@ -77,13 +81,15 @@ function(quo_bench name)
     target_link_libraries(${target} PRIVATE ${arg_LINK} benchmark::benchmark)
 endfunction()
 
-# quo_fuzz(name SOURCES ... COMPONENTS component ...): one libFuzzer target, seeded from fuzz/corpus/<name>.
+# quo_fuzz(name SOURCES ... COMPONENTS component ...): one libFuzzer target, seeded from fuzz/corpus/<name>, and part
+# of the target fuzz_targets.
 function(quo_fuzz name)
     cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "SOURCES;COMPONENTS")
     set(target ${name}_fuzz)
     add_executable(${target} ${arg_SOURCES})
     quo_link_components(${target} ${arg_COMPONENTS})
     target_link_options(${target} PRIVATE -fsanitize=fuzzer)
+    add_dependencies(fuzz_targets ${target})
 endfunction()
 
 function(quo_add_existing folder)

@@ -48,6 +48,13 @@ typedef struct FftPlan {
 /** Name of the engine, which is loaded if none is yet: "mkl", "fftw", or "none" where neither can be loaded. */
 QUO_BASE_API const char* fft_engine_name(void) QUO_NOEXCEPT;
 
+/** Why the engine failed on this thread: no engine can be loaded, memory is too short, or what the engine's
+ * library answered. Statuses 4, 5 and 7 of the functions below leave it; making the next plan empties it. Nothing
+ * of the kind goes into the report.
+ * @return the text, empty where there is none; never null, and valid until this thread's next call of this header
+ */
+QUO_BASE_API const char* fft_engine_error(void) QUO_NOEXCEPT;
+
 /* ---- Complex transforms ---- */
 
 /** Makes a plan for complex images.
@@ -60,8 +67,9 @@ QUO_BASE_API const char* fft_engine_name(void) QUO_NOEXCEPT;
  * @param[in]  in_place  0: the plan will be run from one buffer into another; else within one buffer
  * @return 0; 1 for a null plan, n < 1, m < 1 or an image that no address space holds; 2 for nfft outside 1..n; 3
  * for mfft outside 1..m; 4 when the row transforms cannot be had (unknown direction, no memory, no engine); 5 when
- * the column transforms cannot be had, in which case nothing is left of the rows'. Only a missing engine is
- * reported. */
+ * the column transforms cannot be had, in which case nothing is left of the rows'. fft_engine_error() tells the
+ * cause where it lies with the engine. Memory that the engine may take is looked for before it starts: some five
+ * times the transform, ten times with prime factors above 13, and up to 100 MiB more. */
 QUO_BASE_API int fft_makep_c(FftPlan* plan, int n, int nfft, int m, int mfft, int dir_rows, int dir_cols,
                              int in_place) QUO_NOEXCEPT;
 
@@ -78,8 +86,9 @@ QUO_BASE_API int fft_makep_c(FftPlan* plan, int n, int nfft, int m, int mfft, in
  * refuses to run, out of memory (what stands in `out` is then undefined). */
 QUO_BASE_API int pfft_c(const FftPlan* plan, const fcomplex* in, fcomplex* out) QUO_NOEXCEPT;
 
-/** Releases a plan of either kind and clears the record.
- * @return 0; 1 for a null pointer, a record that was never made, or a plan that was released before */
+/** Releases a plan of either kind and clears the record. A record of zeros, which a released one is too, holds
+ * nothing to release.
+ * @return 0; 1 for a null pointer, or handles that were released through another record or never made */
 QUO_BASE_API int fft_destp_c(FftPlan* plan) QUO_NOEXCEPT;
 
 /** Makes a plan (in place where in == out), runs it and releases it.
@@ -137,8 +146,8 @@ QUO_BASE_API int czt_makep_c(CztPlan* plan, int N, int M) QUO_NOEXCEPT;
 QUO_BASE_API int pczt_c(const CztPlan* plan, const fcomplex* in, fcomplex* out, double w, double a,
                         int count) QUO_NOEXCEPT;
 
-/** Releases a chirp-z plan and clears the record.
- * @return 0; 1 for a null pointer or a plan that was released before or never made */
+/** Releases a chirp-z plan and clears the record, as fft_destp_c() does.
+ * @return 0; 1 for a null pointer, or handles that were released through another record or never made */
 QUO_BASE_API int czt_destp_c(CztPlan* plan) QUO_NOEXCEPT;
 
 /** Makes a chirp-z plan, runs it and releases it.

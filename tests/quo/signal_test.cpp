@@ -150,6 +150,12 @@ TEST_F(SignalVerbs, RefusalsNameTheCauseAndLeaveNothing) {
                            {{"resample", in, out, "--samples", "9", "--lines", "9"}, 2, "2 were given"},
                            {{"resample", in, out, "--samples", "0"}, 2, "--samples"},
                            {{"resample", in, out, "--samples", "9", "--centre", "0.1"}, 2, "--centre"},
+                           // Passed for a centre, and made every sample one that is no number.
+                           {{"resample", in, out, "--samples", "9", "--centre", "nan"}, 2, "nan is no number"},
+                           {{"resample", in, out, "--samples", "9", "--centre", "inf"}, 2, "inf is no number"},
+                           {{"resample", in, out, "--samples", "9", "--centre", "0.6"}, 2, "-0.5 to 0.5"},
+                           // The engine ended the process where its memory did not suffice.
+                           {{"resample", in, out, "--samples", "2147483647"}, 1, "not enough memory"},
                            {{"resample", in, out, "--lines", "99999999999"}, 2, "--lines"}}) {
         const test::Finished finished = test::quo(row.arguments);
         EXPECT_EQ(finished.exit_status, row.exit_status);

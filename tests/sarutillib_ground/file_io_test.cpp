@@ -2,12 +2,15 @@
 
 #include <fcntl.h>
 #include <gmock/gmock.h>
+#include <grp.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include <cerrno>
 #include <cstdint>
+#include <cstdlib>
 #include <filesystem>
 #include <limits>
 #include <string>
@@ -167,8 +170,7 @@ TEST_F(AtomicFileTest, RefusesWhatIsNoFileToReplace) {
     for (const std::string& name :
          {folder_.file("folder"), folder_.file("folder/"), folder_.file("."), folder_.file("loop"),
           folder_.file("pipe"), folder_.file("missing/header.xml"), folder_.file("pipe/x"),
-          folder_.file("missing/"), folder_.file(std::string(256, 'x')), std::string{"/dev/null"},
-          std::string{}}) {
+          folder_.file("missing/"), folder_.file(std::string(256, 'x')), std::string{}}) {
         SCOPED_TRACE(name);
         errno = 0;
         AtomicFile file{name.c_str()};
@@ -211,6 +213,118 @@ TEST_F(AtomicFileTest, KeepsTheOldFileWhicheverWriteFails) {
         EXPECT_EQ(replaced, fits);
         EXPECT_EQ(error, fits ? 0 : EFBIG);
         expect_header(fits ? content : "old");
+    }
+}
+
+/** Rights in a folder where the file may be written but nothing put beside it or in its place. */
+struct ClosedFolder {
+    const char* name;
+    mode_t folder;
+};
+constexpr ClosedFolder kClosedFolders[] = {{"NothingMayBeMade", 0555}, {"NothingMayBeReplaced", 01777}};
+
+// Refused, the change was lost although the file itself could be written.
+TEST_F(AtomicFileTest, WritesInPlaceWhereNothingCanBeReplaced) {
+    for (const auto& [name, folder_mode] : kClosedFolders) {
+        SCOPED_TRACE(name);
+        chmod(name_.c_str(), 0666);
+        chmod(folder_.path().c_str(), folder_mode);
+        for (const char* content : {"longer than the old one", "x"}) {
+            const test::OrdinaryUser user;
+            AtomicFile file{name_.c_str()};
+            EXPECT_TRUE(file.write(content) && file.commit());
+            EXPECT_TRUE(file.in_place());
+            expect_header(content);
+        }
+        struct stat found {};
+        EXPECT_EQ(stat(name_.c_str(), &found), 0);
+        EXPECT_EQ(found.st_uid, geteuid());
+    }
+    AtomicFile null{"/dev/null"};
+    EXPECT_TRUE(null.write("swallowed") && null.commit() && null.in_place());
+    EXPECT_TRUE(fs::is_character_file("/dev/null"));
+}
+
+/** A user who may do what the group may. */
+class Member {
+public:
+    explicit Member(gid_t group) {
+        ready_ = setgroups(1, &group) == 0 && setegid(1001) == 0 && seteuid(1001) == 0;
+    }
+    ~Member() {
+        if (seteuid(0) != 0 || setegid(0) != 0 || setgroups(0, nullptr) != 0) std::abort();
+    }
+    Member(const Member&) = delete;
+    Member& operator=(const Member&) = delete;
+    [[nodiscard]] bool ready() const { return ready_; }
+
+private:
+    bool ready_ = false;
+};
+
+// Owner and group were taken over together or not at all: the group lost a file as soon as another member saved
+// it.
+TEST_F(AtomicFileTest, LeavesAFileToItsGroup) {
+    constexpr uid_t kOwner = 1000;
+    constexpr gid_t kGroup = 2000;
+    if (geteuid() != 0 || chown(name_.c_str(), kOwner, kGroup) != 0) GTEST_SKIP() << "needs the administrator";
+    chmod(name_.c_str(), 0660);
+    chmod(folder_.path().c_str(), 0777);
+    {
+        const Member member{kGroup};
+        ASSERT_TRUE(member.ready());
+        EXPECT_TRUE(replace(name_, "new"));
+    }
+    struct stat found {};
+    EXPECT_EQ(stat(name_.c_str(), &found), 0);
+    EXPECT_EQ(found.st_gid, kGroup);
+    EXPECT_EQ(mode_of(name_), 0660U);
+    expect_header("new");
+}
+
+// A killed process leaves its temporary file; the next save of the same file takes it away, but never a living
+// one's.
+TEST_F(AtomicFileTest, SweepsWhatKilledProcessesLeft) {
+    for (int killed = 0; killed < 3; ++killed) {
+        if (const pid_t child = fork(); child == 0) {
+            AtomicFile file{name_.c_str()};
+            _exit(file.write("half") ? 0 : 1);
+        } else {
+            int status = 0;
+            ASSERT_EQ(waitpid(child, &status, 0), child);
+            EXPECT_EQ(status, 0);
+        }
+        expect_header("old", 1);
+    }
+    AtomicFile living{name_.c_str()};
+    EXPECT_TRUE(living.write("first"));
+    EXPECT_TRUE(replace(name_, "second"));
+    expect_header("second", 1);
+    EXPECT_TRUE(living.commit());
+    expect_header("first");
+}
+
+// A raster is of no use with the description of another.
+TEST_F(AtomicFileTest, ReplacesBothFilesOfAPairOrNone) {
+    const std::string other = folder_.file("other");
+    for (const bool is_old : {true, false}) {
+        for (const bool fails : {false, true}) {
+            SCOPED_TRACE(testing::Message() << is_old << fails);
+            fs::remove_all(other);
+            if (is_old)
+                write_text(name_, "old");
+            else
+                fs::remove(name_);
+            AtomicFile first{name_.c_str()}, second{other.c_str()};
+            EXPECT_TRUE(first.write_at(3, " new") && first.write_at(0, "the") && second.write("its description"));
+            if (fails) fs::create_directory(other);
+            EXPECT_EQ(commit_pair(first, second), !fails);
+            EXPECT_EQ(errno != 0, fails);
+            EXPECT_EQ(read_text(name_), fails ? is_old ? "old" : "" : "the new");
+            EXPECT_EQ(fs::is_directory(other), fails);
+            const std::ptrdiff_t files = fails && !is_old ? 1 : 2;
+            EXPECT_EQ(std::distance(fs::directory_iterator{folder_.path()}, fs::directory_iterator{}), files);
+        }
     }
 }
 

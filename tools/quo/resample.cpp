@@ -10,6 +10,7 @@
 #include "commands.h"
 #include "failure.h"
 #include "interrupt.h"
+#include "number.h"
 #include "progress.h"
 #include "quo_base/interp.h"
 #include "raster.h"
@@ -46,18 +47,11 @@ class Resampler {
 public:
     /** @param centre  of the band, cycles per sample of the input, which is brought to frequency 0 meanwhile */
     Resampler(const Size& in, const Size& out, double centre) : in_{in}, out_{out} {
-        if (centre != 0.0) {
-            const double length_in = length(in), length_out = length(out);
-            down_ = ramp(-centre, length(in));
-            up_ = ramp(centre * length_in / length_out, length(out));
-        }
-        if (out.count() >= in.count()) {
-            require_transform(longer_.setplans(in.nx, in.ny, out.nx, out.ny));
-            return;
-        }
-        const int rows = along() ? 1 : 0, columns = 1 - rows;
-        forward_.emplace(in.nx, in.ny, rows, columns);
-        inverse_.emplace(out.nx, out.ny, -2 * rows, -2 * columns);
+        make_plans();  // first: they are refused where the lengths are beyond memory
+        if (centre == 0.0) return;
+        const double length_in = length(in), length_out = length(out);
+        down_ = ramp(-centre, length(in));
+        up_ = ramp(centre * length_in / length_out, length(out));
     }
 
     /** The input is overwritten. */
@@ -68,6 +62,15 @@ public:
     }
 
 private:
+    void make_plans() {
+        if (out_.count() >= in_.count()) {
+            require_transform(longer_.setplans(in_.nx, in_.ny, out_.nx, out_.ny));
+            return;
+        }
+        const int rows = along() ? 1 : 0, columns = 1 - rows;
+        forward_.emplace(in_.nx, in_.ny, rows, columns);
+        inverse_.emplace(out_.nx, out_.ny, -2 * rows, -2 * columns);
+    }
     [[nodiscard]] bool along() const { return in_.ny == 1 && out_.ny == 1; }
     [[nodiscard]] int length(const Size& size) const { return along() ? size.nx : size.ny; }
     /** Samples that belong together: of a row that is a place on the axis, or single ones. */
@@ -199,6 +202,13 @@ private:
     std::vector<double> real_doubles_;
 };
 
+/** What is wrong with a centre; empty for none. A range alone lets through what is no number. */
+std::string defect_of_centre(const std::string& text) {
+    const auto centre = finite_number(text);
+    if (!centre) return text + " is no number of cycles per sample";
+    return *centre >= -0.5 && *centre <= 0.5 ? "" : text + " is not within -0.5 to 0.5 cycles per sample";
+}
+
 int resample(const ResampleOptions& options) {
     require_raster_apart(options.in, options.out);
     DataFile description;
@@ -224,7 +234,7 @@ void add_resample(CLI::App& app, Job& job) {
     size->add_option("--samples", options->samples, "Samples per line")->check(CLI::Range(1, INT_MAX));
     size->add_option("--lines", options->lines, "Lines")->check(CLI::Range(1, INT_MAX));
     command->add_option("--centre", options->centre, "Centre of the band in cycles per sample, where it is not 0")
-        ->check(CLI::Range(-0.5, 0.5));
+        ->check(defect_of_centre);
     add_waitbar_option(*command, options->waitbar);
     command->callback([options, &job] { job = [options] { return resample(*options); }; });
 }

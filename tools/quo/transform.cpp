@@ -1,7 +1,6 @@
 #include "transform.h"
 
 #include <string>
-#include <string_view>
 
 #include "failure.h"
 
@@ -9,11 +8,8 @@ namespace tool {
 
 void require_transform(int status) {
     if (status == QUO_OK) return;
-    if (std::string_view{fft_engine_name()} == "none")
-        throw Failure(
-            "no FFT engine can be loaded: put libquo_base_fftw.so into quo_base/ beside the library, or install "
-            "MKL");
-    throw Failure("the transform cannot be had, status " + std::to_string(status));
+    const std::string cause = fft_engine_error();
+    throw Failure(cause.empty() ? "the transform cannot be had, status " + std::to_string(status) : cause);
 }
 
 Transform::Transform(int n, int m, int along_rows, int down_columns) {

@@ -181,8 +181,9 @@ int fit_by_normal_equations(const FitName& name, const WeightedPoints& points, d
 /** Householder QR with column pivoting of a column-major matrix, carrying one right-hand side along. */
 class PivotedQr {
 public:
-    PivotedQr(double* columns, double* b, int rows, int cols, int* order)
-        : a_{columns}, b_{b}, rows_{rows}, cols_{cols}, order_{order} {
+    /** `leads` and `order` have room for a value per column. */
+    PivotedQr(double* columns, double* b, int rows, int cols, double* leads, int* order)
+        : a_{columns}, b_{b}, rows_{rows}, cols_{cols}, leads_{leads}, order_{order} {
         for (int j = 0; j < cols; ++j) order[j] = j;
     }
 
@@ -202,13 +203,31 @@ public:
     [[nodiscard]] double residual_norm() const { return norm(b_ + rank_, rows_ - rank_); }
 
     /** Parameters by back substitution; those of dependent columns are 0. */
-    void solve(double* x) const {
+    void solve(double* x) const { solve_upper(b_, x); }
+    /** The same for another right-hand side that has been through the reflections. */
+    void solve_upper(const double* b, double* x) const {
         std::fill_n(x, cols_, 0.0);
         for (int i = rank_ - 1; i >= 0; --i) {
-            double value = b_[i];
+            double value = b[i];
             for (int j = i + 1; j < rank_; ++j) value -= column(j)[i] * x[order_[j]];
             x[order_[i]] = value / column(i)[i];
         }
+    }
+    /** h of R^T h = g, where g has the columns' own order. */
+    void solve_lower(const double* g, double* h) const {
+        for (int i = 0; i < rank_; ++i) {
+            double value = g[order_[i]];
+            for (int j = 0; j < i; ++j) value -= column(i)[j] * h[j];
+            h[i] = value / column(i)[i];
+        }
+    }
+    /** v becomes Q^T v. */
+    void reflect_forward(double* v) const {
+        for (int k = 0; k < rank_; ++k) reflect(k, v);
+    }
+    /** v becomes Q v. */
+    void reflect_backward(double* v) const {
+        for (int k = rank_ - 1; k >= 0; --k) reflect(k, v);
     }
 
     static double norm(const double* v, int n) {
@@ -244,7 +263,19 @@ private:
         const double half_square = -diagonal * pivot[0];
         for (int j = rank_ + 1; j < cols_; ++j) apply(pivot, half_square, column(j) + rank_, n);
         apply(pivot, half_square, b_ + rank_, n);
-        pivot[0] = diagonal;
+        leads_[rank_] = std::exchange(pivot[0], diagonal);
+    }
+
+    // One reflection again: its vector stands below the diagonal, the first element among the leads.
+    void reflect(int k, double* v) const {
+        const double *const rest = column(k) + k + 1, lead = leads_[k];
+        double* const below = v + k + 1;
+        const int n = rows_ - k - 1;
+        double sum = lead * v[k];
+        for (int i = 0; i < n; ++i) sum += rest[i] * below[i];
+        const double factor = sum / (-column(k)[k] * lead);
+        v[k] -= factor * lead;
+        quo::subtract_multiple(below, rest, factor, n);
     }
 
     static void apply(const double* u, double half_square, double* v, int n) {
@@ -255,9 +286,78 @@ private:
 
     double *a_, *b_;
     int rows_, cols_;
+    double* leads_;
     int* order_;
     int rank_ = 0;
     double first_ = 0.0, last_ = 0.0;
+};
+
+/** Corrects a solution and its residual together by what they leave of r + A x = b and A^T r = 0, in extended
+ * precision: large residuals cost a solution as many digits as the square of the condition has, and get them back
+ * so (A. Bjorck, "Iterative refinement of linear least squares solutions I", BIT 7, 1967). */
+class Refinement {
+public:
+    static std::size_t room(int rows, int cols) {
+        return 2 * static_cast<std::size_t>(rows) + 3 * static_cast<std::size_t>(cols);
+    }
+    /** `a` is the column-major matrix that `qr` has decomposed; `work` holds room() values. */
+    Refinement(const PivotedQr& qr, const double* a, const double* b, int rows, int cols, double* work)
+        : qr_{qr},
+          a_{a},
+          b_{b},
+          rows_{rows},
+          cols_{cols},
+          residual_{work},
+          change_{work + rows},
+          gradient_{change_ + rows},
+          lower_{gradient_ + cols},
+          step_{lower_ + cols} {}
+
+    /** Steps are taken while each is far shorter than the one before. For matrices of full rank. */
+    void run(double* x) {
+        constexpr int kMostSteps = 4;
+        std::fill_n(residual_, rows_, 0.0);
+        for (int i = 0; i < rows_; ++i) residual_[i] = left_over(x, i);
+        double before = PivotedQr::norm(x, cols_);
+        for (int k = 0; k < kMostSteps; ++k) {
+            find_step(x);
+            const double length = PivotedQr::norm(step_, cols_);
+            if (!(length < 0.25 * before)) return;
+            before = length;
+            for (int j = 0; j < cols_; ++j) x[j] += step_[j];
+            for (int i = 0; i < rows_; ++i) residual_[i] += change_[i];
+        }
+    }
+    [[nodiscard]] double residual_norm() const { return PivotedQr::norm(residual_, rows_); }
+
+private:
+    using Extended = long double;
+
+    // b - A x less the residual at hand, at one point.
+    [[nodiscard]] double left_over(const double* x, int i) const {
+        Extended sum = Extended{b_[i]} - residual_[i];
+        for (std::ptrdiff_t j = 0; j < cols_; ++j) sum -= Extended{a_[j * rows_ + i]} * x[j];
+        return static_cast<double>(sum);
+    }
+    void find_step(const double* x) {
+        for (int i = 0; i < rows_; ++i) change_[i] = left_over(x, i);
+        for (std::ptrdiff_t j = 0; j < cols_; ++j) {
+            Extended sum = 0.0;
+            for (std::ptrdiff_t i = 0; i < rows_; ++i) sum -= Extended{a_[j * rows_ + i]} * residual_[i];
+            gradient_[j] = static_cast<double>(sum);
+        }
+        qr_.solve_lower(gradient_, lower_);
+        qr_.reflect_forward(change_);
+        for (int j = 0; j < cols_; ++j) change_[j] -= lower_[j];
+        qr_.solve_upper(change_, step_);
+        std::copy_n(lower_, cols_, change_);
+        qr_.reflect_backward(change_);
+    }
+
+    const PivotedQr& qr_;
+    const double *a_, *b_;
+    int rows_, cols_;
+    double *residual_, *change_, *gradient_, *lower_, *step_;
 };
 
 bool all_finite(const double* values, std::size_t count) {
@@ -303,19 +403,28 @@ int lsq_fit(const double* a, int rows, int cols, const double* b, double* x, Lsq
     if (!all_finite(a, elements) || !all_finite(b, static_cast<std::size_t>(rows))) {
         return frame.fail(QUO_NUMERIC, "A value to fit is not finite");
     }
-    quo::TrackedBuffer<double> columns{elements};
-    quo::TrackedBuffer<double> right{static_cast<std::size_t>(rows)};
-    quo::TrackedBuffer<int> work{2 * static_cast<std::size_t>(cols)};
-    if (!columns || !right || !work) return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
+    const auto parameters = static_cast<std::size_t>(cols), points = static_cast<std::size_t>(rows);
+    quo::TrackedBuffer<double> columns{elements}, scaled{elements};
+    quo::TrackedBuffer<double> work{points + parameters + Refinement::room(rows, cols)};
+    quo::TrackedBuffer<int> places{2 * parameters};
+    if (!columns || !scaled || !work || !places) return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
 
-    int* exponents = work.data() + cols;
-    scale_columns(a, rows, cols, columns.data(), exponents);
-    std::copy_n(b, rows, right.data());
-    PivotedQr qr{columns.data(), right.data(), rows, cols, work.data()};
-    const int rank = qr.run(rows * 0x1p-52);
+    double *const right = work.data(), *const leads = right + rows;
+    int* const exponents = places.data() + cols;
+    scale_columns(a, rows, cols, scaled.data(), exponents);
+    std::copy_n(scaled.data(), elements, columns.data());
+    std::copy_n(b, rows, right);
+    PivotedQr qr{columns.data(), right, rows, cols, leads, places.data()};
+    LsqSummary found{
+        .rank = qr.run(rows * 0x1p-52), .condition = qr.condition(), .residual_norm = qr.residual_norm()};
     qr.solve(x);
+    if (found.rank == cols) {
+        Refinement refinement{qr, scaled.data(), b, rows, cols, leads + cols};
+        refinement.run(x);
+        found.residual_norm = refinement.residual_norm();
+    }
     for (int j = 0; j < cols; ++j) x[j] = std::ldexp(x[j], -exponents[j]);
-    if (summary) *summary = {rank, qr.condition(), qr.residual_norm()};
+    if (summary) *summary = found;
     return frame.success();
 }
 

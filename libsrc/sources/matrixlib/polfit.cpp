@@ -130,8 +130,9 @@ int gen_polfit(int ncoef, const double* x, const double* y, int n, double* c, do
 }
 
 double polval(const double* c, int d, double x) noexcept {
-    double value = 0.0;
-    for (int i = d; i >= 0; --i) value = value * x + c[i];
+    if (d < 0) return 0.0;
+    double value = c[d];  // not 0 * x + c[d], which is no number at infinity
+    for (int i = d - 1; i >= 0; --i) value = value * x + c[i];
     return value;
 }
 

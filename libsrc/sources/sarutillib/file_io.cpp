@@ -1,13 +1,17 @@
 #include "sarutillib/file_io.h"
 
 #include <fcntl.h>
+#include <sys/file.h>
+#include <sys/mman.h>
 #include <sys/random.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <array>
 #include <cerrno>
 #include <climits>
+#include <cstdio>
 #include <exception>
 #include <utility>
 
@@ -17,7 +21,8 @@ namespace quo {
 namespace {
 
 constexpr int kMostLinks = 40;         // as many as the kernel follows
-constexpr int kTemporaryTries = 32;    // names are random: a second try is already rare
+constexpr unsigned kSlots = 4;         // temporary names that are looked through for those of killed processes
+constexpr int kTemporaryTries = 32;    // of random names, where more processes than slots save one file at once
 constexpr mode_t kPermissions = 0777;  // set-user and set-group bits go, as they do whenever a file is written
 
 bool refuse(int error) noexcept {
@@ -71,11 +76,56 @@ Descriptor open_folder(const std::string& folder) noexcept {
     return opened;
 }
 
-std::string temporary_name() {
+/** The same for every process that saves a file of this name, so that each finds what another left behind. */
+std::string slot_name(std::string_view name, unsigned slot) {
+    std::uint64_t hash = 0xcbf29ce484222325;  // FNV-1a
+    for (const char c : name) hash = (hash ^ static_cast<unsigned char>(c)) * 0x100000001b3;
+    std::array<char, 40> text;
+    return {text.data(), format_bounded(text.data(), text.size(), ".quo-%016llx-%u.tmp",
+                                        static_cast<unsigned long long>(hash), slot)};
+}
+
+std::string random_name() {
     unsigned long long number = 0;
     (void)::getrandom(&number, sizeof number, 0);
-    char name[40];
-    return {name, format_bounded(name, sizeof name, ".quo-%016llx.tmp", number)};
+    std::array<char, 40> text;
+    return {text.data(), format_bounded(text.data(), text.size(), ".quo-%016llx.tmp", number)};
+}
+
+/** Whether `name` is still the name of the open file. */
+bool is_entry(int folder, const std::string& name, int file) noexcept {
+    struct stat entry {
+    }, opened{};
+    return ::fstat(file, &opened) == 0 && ::fstatat(folder, name.c_str(), &entry, AT_SYMLINK_NOFOLLOW) == 0 &&
+           entry.st_dev == opened.st_dev && entry.st_ino == opened.st_ino;
+}
+
+bool lock(int file) noexcept {
+    return retried([=] { return ::flock(file, LOCK_EX | LOCK_NB); }) == 0;
+}
+
+/** Takes away a temporary file whose process is gone: living ones hold a lock on theirs. Never follows a link and
+ * never waits. */
+void sweep(int folder, const std::string& name) noexcept {
+    constexpr int kFlags = O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
+    const Descriptor left{::openat(folder, name.c_str(), kFlags)};
+    struct stat found {};
+    if (left && ::fstat(left.get(), &found) == 0 && S_ISREG(found.st_mode) && lock(left.get()) &&
+        is_entry(folder, name, left.get()))
+        (void)::unlinkat(folder, name.c_str(), 0);
+}
+
+/** A file without a name, on the disk where it can be, since rasters are large. */
+Descriptor nameless_file() noexcept {
+    Descriptor file{::open(P_tmpdir, O_TMPFILE | O_RDWR | O_CLOEXEC, 0600)};
+    if (!file) file = Descriptor{::memfd_create("quo", MFD_CLOEXEC)};
+    return file;
+}
+
+/** Whether a target may still be written in place when making or renaming a file beside it fails like this. A full
+ * disk is not among them: there an old file is worth more than half a new one. */
+bool forbids_replacing(int error) noexcept {
+    return error == EACCES || error == EPERM || error == EROFS || error == EBUSY;
 }
 
 /** Some file systems cannot flush a folder and need not: that is no failure. */
@@ -83,14 +133,60 @@ bool flush_folder(int folder) noexcept {
     return retried([=] { return ::fsync(folder); }) == 0 || errno == EINVAL || errno == ENOTSUP || errno == EBADF;
 }
 
-/** Gives a new file the owner and permissions of the one it replaces. Only a privileged process can pass on a
- * foreign owner; the permissions come second because a change of owner clears some. */
+/** Gives a new file the owner, group and permissions of the one it replaces. Owner and group are tried each on its
+ * own: only a privileged process can pass on a foreign owner, but any member can pass on the group, without which
+ * a file shared by the group would be lost to the others. Whoever comes in through another group than the old one
+ * gets the rights of all others. The permissions come last because a change of owner clears some. */
 bool adopt(int file, const struct stat& old) noexcept {
+    constexpr auto kSame = static_cast<uid_t>(-1);
     struct stat now {};
     if (::fstat(file, &now) != 0) return false;
-    if (now.st_uid != old.st_uid || now.st_gid != old.st_gid)
-        if (::fchown(file, old.st_uid, old.st_gid) != 0) errno = 0;
-    return ::fchmod(file, old.st_mode & kPermissions) == 0;
+    if (now.st_uid != old.st_uid) (void)::fchown(file, old.st_uid, kSame);
+    const bool same_group = now.st_gid == old.st_gid || ::fchown(file, kSame, old.st_gid) == 0;
+    errno = 0;
+    const mode_t mode = old.st_mode & kPermissions;
+    return ::fchmod(file, same_group ? mode : (mode & ~mode_t{070}) | (mode & 07U) << 3U) == 0;
+}
+
+/** Calls `put(bytes, done)` with what is left of `bytes` until all are written. */
+template <typename Put>
+bool put_all(std::string_view bytes, Put put) noexcept {
+    std::size_t done = 0;
+    while (done < bytes.size()) {
+        const ssize_t more = retried([&] { return put(bytes.substr(done), static_cast<off_t>(done)); });
+        if (more < 0) return false;
+        if (more == 0) return refuse(ENOSPC);
+        done += static_cast<std::size_t>(more);
+    }
+    return true;
+}
+
+bool write_all(int file, std::string_view bytes) noexcept {
+    return put_all(bytes, [=](std::string_view rest, off_t) { return ::write(file, rest.data(), rest.size()); });
+}
+
+/** Writes the whole of one file to where the other stands. */
+bool copy_content(int from, int to) {
+    std::string piece(std::size_t{1} << 20U, '\0');
+    for (off_t place = 0;;) {
+        const ssize_t got = retried([&] { return ::pread(from, piece.data(), piece.size(), place); });
+        if (got <= 0) return got == 0;
+        if (!write_all(to, {piece.data(), static_cast<std::size_t>(got)})) return false;
+        place += got;
+    }
+}
+
+/** Overwrites an open file. Room for what it grows by is taken before its first byte changes. */
+bool overwrite_content(int from, int to) {
+    struct stat source {
+    }, target{};
+    if (::fstat(from, &source) != 0 || ::fstat(to, &target) != 0) return false;
+    if (!S_ISREG(target.st_mode)) return copy_content(from, to);
+    const off_t grows_by = source.st_size - target.st_size;
+    const auto take_room = [=] { return ::fallocate(to, FALLOC_FL_KEEP_SIZE, target.st_size, grows_by); };
+    if (grows_by > 0 && retried(take_room) != 0 && errno != EOPNOTSUPP && errno != ENOSYS) return false;
+    return copy_content(from, to) && retried([&] { return ::ftruncate(to, source.st_size); }) == 0 &&
+           retried([&] { return ::fsync(to); }) == 0;
 }
 
 /** Reads to the end into `text`, at most `limit` bytes. */
@@ -159,27 +255,52 @@ bool AtomicFile::open(std::string path) {
     struct stat old {};
     if (::fstatat(folder_.get(), name_.c_str(), &old, AT_SYMLINK_NOFOLLOW) != 0)
         return errno == ENOENT && create_temporary(0666);
+    if (S_ISCHR(old.st_mode)) return collect_elsewhere();
     if (!S_ISREG(old.st_mode)) return refuse(S_ISDIR(old.st_mode) ? EISDIR : EINVAL);
     if (::faccessat(folder_.get(), name_.c_str(), W_OK, AT_EACCESS) != 0) return false;
     // Nobody else may read the new content before it carries the old file's permissions.
-    return create_temporary(0600) && adopt(file_.get(), old);
+    if (create_temporary(0600)) return adopt(file_.get(), old);
+    return forbids_replacing(errno) && collect_elsewhere();
 }
 
 bool AtomicFile::create_temporary(unsigned mode) {
-    for (int tries = 0; tries < kTemporaryTries; ++tries) {
-        temporary_ = temporary_name();
-        file_ =
-            Descriptor{::openat(folder_.get(), temporary_.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, mode)};
-        if (file_) return true;
-        if (errno != EEXIST) break;
+    bool made = false;
+    for (unsigned slot = 0; slot < kSlots; ++slot) {
+        const std::string name = slot_name(name_, slot);
+        sweep(folder_.get(), name);
+        if (!made) made = create_in_slot(name, mode);
+        if (!made && errno != EEXIST) return false;
     }
+    for (int tries = 0; !made && tries < kTemporaryTries; ++tries) {
+        made = create_in_slot(random_name(), mode);
+        if (!made && errno != EEXIST) return false;
+    }
+    return made;
+}
+
+bool AtomicFile::create_in_slot(const std::string& name, unsigned mode) {
+    file_ = Descriptor{::openat(folder_.get(), name.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, mode)};
+    if (!file_) return false;
+    temporary_ = name;
+    // Between its making and its locking another process can take the file for one that was left behind. Where
+    // there are no locks nothing is swept either.
+    if ((lock(file_.get()) || errno != EWOULDBLOCK) && is_entry(folder_.get(), name, file_.get())) return true;
     temporary_.clear();
-    return false;
+    file_ = Descriptor{};
+    return refuse(EEXIST);
+}
+
+bool AtomicFile::collect_elsewhere() {
+    target_ = Descriptor{::openat(folder_.get(), name_.c_str(), O_WRONLY | O_NOFOLLOW | O_NOCTTY | O_CLOEXEC)};
+    if (target_) file_ = nameless_file();
+    in_place_ = good();
+    return good();
 }
 
 void AtomicFile::discard() noexcept {
     const int error_before = errno;
-    (void)file_.close();
+    file_ = Descriptor{};
+    target_ = Descriptor{};
     if (!temporary_.empty()) (void)::unlinkat(folder_.get(), temporary_.c_str(), 0);
     temporary_.clear();
     errno = error_before;
@@ -187,31 +308,118 @@ void AtomicFile::discard() noexcept {
 
 bool AtomicFile::write(std::string_view bytes) noexcept {
     if (!good()) return false;
-    while (!bytes.empty()) {
-        const ssize_t done = retried([&] { return ::write(file_.get(), bytes.data(), bytes.size()); });
-        if (done <= 0) {
-            if (done == 0) errno = ENOSPC;
-            discard();
-            return false;
-        }
-        bytes.remove_prefix(static_cast<std::size_t>(done));
+    if (!write_all(file_.get(), bytes)) {
+        discard();
+        return false;
     }
     errno = 0;
     return true;
 }
 
-bool AtomicFile::commit() noexcept {
-    if (!good()) return refuse(errno != 0 ? errno : EBADF);
-    errno = 0;
-    if (retried([&] { return ::fsync(file_.get()); }) != 0 || !file_.close() ||
-        ::renameat(folder_.get(), temporary_.c_str(), folder_.get(), name_.c_str()) != 0) {
+bool AtomicFile::write_at(std::int64_t place, std::string_view bytes) noexcept {
+    if (!good()) return false;
+    const auto put = [&](std::string_view rest, off_t done) {
+        return ::pwrite(file_.get(), rest.data(), rest.size(), place + done);
+    };
+    if (!put_all(bytes, put)) {
         discard();
         return false;
     }
-    temporary_.clear();
-    if (!flush_folder(folder_.get())) return false;
     errno = 0;
     return true;
+}
+
+bool AtomicFile::flush_content() const noexcept {
+    if (!good()) return refuse(errno != 0 ? errno : EBADF);
+    return in_place_ || retried([&] { return ::fsync(file_.get()); }) == 0;
+}
+
+/** Puts the new file into the old one's place. */
+bool AtomicFile::replace() noexcept {
+    if (in_place_) return overwrite();
+    if (::renameat(folder_.get(), temporary_.c_str(), folder_.get(), name_.c_str()) == 0) {
+        temporary_.clear();
+        return true;
+    }
+    return forbids_replacing(errno) && overwrite();
+}
+
+/** As replace(), but the old file is kept under the temporary name, locked so that nobody sweeps it. */
+bool AtomicFile::replace_keeping_old() {
+    const int folder = folder_.get();
+    struct stat old {};
+    const bool is_old = ::fstatat(folder, name_.c_str(), &old, AT_SYMLINK_NOFOLLOW) == 0 && S_ISREG(old.st_mode);
+    if (in_place_ || !is_old) return replace();
+    target_ = Descriptor{::openat(folder, name_.c_str(), O_WRONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC)};
+    if (target_) (void)lock(target_.get());
+    keeps_old_ = ::renameat2(folder, temporary_.c_str(), folder, name_.c_str(), RENAME_EXCHANGE) == 0;
+    if (keeps_old_) return true;
+    if (errno != EINVAL && errno != ENOSYS) return replace();
+    // A file system that cannot exchange names: a second name of the old file does as well.
+    const std::string second_name = random_name();
+    const bool named = ::linkat(folder, name_.c_str(), folder, second_name.c_str(), 0) == 0;
+    const bool replaced = replace();
+    if (named && replaced && temporary_.empty()) {
+        temporary_ = second_name;
+        keeps_old_ = true;
+    } else if (named) {
+        (void)::unlinkat(folder, second_name.c_str(), 0);
+    }
+    return replaced;
+}
+
+/** Undoes a replacement that kept the old file; where there was none, the new one goes. */
+void AtomicFile::take_back() noexcept {
+    const int error_before = errno;
+    if (keeps_old_ && ::renameat(folder_.get(), temporary_.c_str(), folder_.get(), name_.c_str()) == 0)
+        temporary_.clear();
+    else if (!keeps_old_ && !in_place_)
+        (void)::unlinkat(folder_.get(), name_.c_str(), 0);
+    errno = error_before;
+}
+
+bool AtomicFile::overwrite() noexcept {
+    constexpr int kFlags = O_WRONLY | O_NOFOLLOW | O_NOCTTY | O_CLOEXEC;
+    in_place_ = true;
+    try {
+        target_ = target_ ? std::move(target_) : Descriptor{::openat(folder_.get(), name_.c_str(), kFlags)};
+        return target_ && overwrite_content(file_.get(), target_.get());
+    } catch (const std::exception&) {
+        return refuse(ENOMEM);
+    }
+}
+
+/** After the replacement: what is left of the old file goes, and the folder reaches the disk. */
+bool AtomicFile::finish() noexcept {
+    discard();
+    errno = 0;
+    if (!in_place_ && !flush_folder(folder_.get())) return false;
+    errno = 0;
+    return true;
+}
+
+bool AtomicFile::commit() noexcept {
+    const bool done = flush_content() && replace();
+    if (!done) discard();
+    return done && finish();
+}
+
+bool commit_pair(AtomicFile& first, AtomicFile& second) noexcept {
+    if (first.in_place_ && !second.in_place_) return commit_pair(second, first);
+    try {
+        if (first.flush_content() && second.flush_content() && first.replace_keeping_old()) {
+            if (second.replace()) {
+                const bool reached = first.finish();
+                return second.finish() && reached;
+            }
+            first.take_back();
+        }
+    } catch (const std::exception&) {
+        errno = ENOMEM;
+    }
+    first.discard();
+    second.discard();
+    return false;
 }
 
 std::optional<std::string> read_file(const char* path, std::int64_t limit) noexcept {

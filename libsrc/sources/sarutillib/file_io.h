@@ -44,9 +44,16 @@ private:
 
 /** Writes a file in one step: the text goes to a temporary file in the target's folder, commit() flushes it to the
  * disk, renames it over the target and flushes the folder. Until then, and whenever anything fails, the old file
- * stays whole and no temporary file is left. A symbolic link keeps pointing at the replaced file; the old file's
- * permissions, and its owner where the process may, are kept. A target that exists and is no regular file (a
- * folder, a device), that may not be written, or whose name the file system cannot hold is refused. */
+ * stays whole and no temporary file is left; the one of a process that was killed goes with the next save of the
+ * same file. A symbolic link keeps pointing at the replaced file, a hard link is broken. The old file's
+ * permissions are kept, its owner and its group too, each where the process may.
+ *
+ * Where no file can be put in the target's place (a folder without the right to write, somebody else's file in a
+ * folder like /tmp, a file mounted by itself, a character device) but the target itself can be written, the
+ * content is collected elsewhere and commit() writes it in place: less safe, since a failure within that last step
+ * can leave a mixture, but nothing is lost for want of rights. in_place() tells, so that the caller can warn. A
+ * target that exists and is none of these (a folder, a pipe), that may not be written, or whose name the file
+ * system cannot hold is refused. */
 class AtomicFile {
 public:
     explicit AtomicFile(const char* path) noexcept;
@@ -59,21 +66,43 @@ public:
     /** Appends to the temporary file at once (no buffer: hand over large pieces). The first failure discards it.
      */
     bool write(std::string_view bytes) noexcept;
-    /** Descriptor of the temporary file, for libraries that write by themselves; -1 when not good(). A caller
-     * whose library fails just does not commit. */
+    /** Writes at a place of its own, for content that comes out of order; otherwise as write(). */
+    bool write_at(std::int64_t place, std::string_view bytes) noexcept;
+    /** Descriptor of the temporary file, for reading and writing, for libraries that write by themselves; -1 when
+     * not good(). A caller whose library fails just does not commit. */
     [[nodiscard]] int descriptor() const noexcept { return file_.get(); }
     /** Makes the new content the file. True when it is on the disk under its final name. Only when the very last
      * step, flushing the folder, fails is the new file in place although this answers false. */
     [[nodiscard]] bool commit() noexcept;
+    /** Whether the target is (or was) written in place. */
+    [[nodiscard]] bool in_place() const noexcept { return in_place_; }
 
 private:
+    friend bool commit_pair(AtomicFile& first, AtomicFile& second) noexcept;
+
     bool open(std::string path);
     bool create_temporary(unsigned mode);
+    bool create_in_slot(const std::string& name, unsigned mode);
+    bool collect_elsewhere();
+    bool flush_content() const noexcept;
+    bool replace() noexcept;
+    bool replace_keeping_old();
+    void take_back() noexcept;
+    bool overwrite() noexcept;
+    bool finish() noexcept;
     void discard() noexcept;
 
     Descriptor folder_, file_;
+    Descriptor target_;             ///< what is written in place, or the old file while it may have to come back
     std::string name_, temporary_;  ///< names within the folder; temporary_ is empty when none exists
+    bool in_place_ = false;
+    bool keeps_old_ = false;  ///< temporary_ is the old file
 };
+
+/** Makes two files that belong together, such as a raster and its description, new in one go: where the second
+ * cannot be replaced, the first gets its old content back. Answers as commit() does. Where one of them is written
+ * in place, so that its old content could not come back, that one is the last. */
+[[nodiscard]] bool commit_pair(AtomicFile& first, AtomicFile& second) noexcept;
 
 /** The whole content of a regular file (or of a pipe or device up to `limit`), or nothing when it cannot be opened
  * or read, is a folder, or holds more than `limit` bytes or than memory can. */

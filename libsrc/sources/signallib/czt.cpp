@@ -7,6 +7,7 @@
 
 #include "quo_base/fft.h"
 #include "sarutillib/checked_size.h"
+#include "signallib/memory_room.h"
 
 namespace {
 
@@ -30,14 +31,16 @@ fcomplex product(fcomplex a, fcomplex b) {
 /** nk = (n^2 + k^2 - (k - n)^2) / 2 turns the sum into a convolution with a chirp of phase k^2 w / 2. */
 class Convolution {
 public:
-    Convolution(const CztPlan& plan, double w) noexcept
-        : plan_{plan},
-          w_{w},
-          length_{plan.forward.n},
-          before_{zeros(plan.N)},
-          after_{zeros(plan.M)},
-          filter_{zeros(length_)},
-          work_{zeros(length_)} {}
+    Convolution(const CztPlan& plan, double w) noexcept : plan_{plan}, w_{w}, length_{plan.forward.n} {
+        const std::size_t need =
+            sizeof(fcomplex) * (std::size_t{2} * static_cast<std::size_t>(length_) +
+                                static_cast<std::size_t>(plan.N) + static_cast<std::size_t>(plan.M));
+        if (!quo::has_room({need, need})) return;
+        before_ = zeros(plan.N);
+        after_ = zeros(plan.M);
+        filter_ = zeros(length_);
+        work_ = zeros(length_);
+    }
     [[nodiscard]] bool has_memory() const { return before_ && after_ && filter_ && work_; }
 
     [[nodiscard]] int prepare(double a) {
@@ -112,7 +115,7 @@ int pczt_c(const CztPlan* plan, const fcomplex* in, fcomplex* out, double w, dou
 }
 
 int czt_destp_c(CztPlan* plan) noexcept {
-    if (!plan || plan->N < 1) return QUO_REFUSED;
+    if (!plan) return QUO_REFUSED;
     const int forward = fft_destp_c(&plan->forward), inverse = fft_destp_c(&plan->inverse);
     *plan = {};
     return forward ? forward : inverse;

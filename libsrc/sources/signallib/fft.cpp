@@ -8,7 +8,6 @@
 #include <optional>
 
 #include "diagnosticslib/errno_kept.h"
-#include "quo_base/ckerr.h"
 #include "sarutillib/checked_size.h"
 #include "signallib/image_size.h"
 #include "signallib/plan_store.h"
@@ -62,27 +61,21 @@ FftEnginePlan* open(quo::FftEngine& engine, const FftGeometry& geometry) noexcep
     const quo::ErrnoKept kept;
     return quo::plan_store().open(engine, geometry);
 } catch (...) {
-    return nullptr;  // out of memory
+    quo::note_fft_error(engine, geometry.length, {.bytes = sizeof geometry});  // of the store's own
+    return nullptr;
 }
 
 void close(const FftEnginePlan* handle) {
     if (handle) quo::plan_store().close(handle);
 }
 
-/** The only thing that plans report: a caller cannot mend it, the person who installs the library can. */
-int no_engine(int status, const char* function, int line = __builtin_LINE()) {
-    quo_add_report(
-        "No FFT engine can be loaded: install libquo_base_fftw.so beside the library in quo_base/, or name it in "
-        "QUO_FFTW_MODULE; or install MKL (libmkl_rt.so, in Debian the package libmkl-rt), or name it in "
-        "QUO_MKL_LIBRARY. QUO_FFT_ENGINE chooses: auto, mkl or fftw",
-        QUO_ERROR, line, function, "fft");
-    return status;
-}
-
-int open_axes(FftPlan& made, const Axis& rows, const Axis& columns, const char* function) {
+int open_axes(FftPlan& made, const Axis& rows, const Axis& columns) {
     if (!rows.wanted() && !columns.wanted()) return QUO_OK;
     quo::FftEngine* const engine = quo::fft_engine();
-    if (!engine) return no_engine(rows.wanted() ? kNoRows : kNoColumns, function);
+    if (!engine) {
+        quo::note_no_fft_engine();
+        return rows.wanted() ? kNoRows : kNoColumns;
+    }
     if (rows.wanted() && !(made.rows = open(*engine, rows.geometry))) return kNoRows;
     if (columns.wanted() && !(made.columns = open(*engine, columns.geometry))) {
         close(made.rows);
@@ -91,13 +84,14 @@ int open_axes(FftPlan& made, const Axis& rows, const Axis& columns, const char* 
     return QUO_OK;
 }
 
-int make_plan(FftPlan* plan, const Request& request, const char* function) {
+int make_plan(FftPlan* plan, const Request& request) {
+    quo::forget_fft_error();
     if (!plan) return kBadSize;
     if (const int status = request.check()) return status;
     const Axis rows = request.rows(), columns = request.columns();
     FftPlan made{nullptr, request.n, request.nfft, rows.normalised(),    rows.sign(),
                  nullptr, request.m, request.mfft, columns.normalised(), columns.sign()};
-    if (const int status = open_axes(made, rows, columns, function)) return status;
+    if (const int status = open_axes(made, rows, columns)) return status;
     *plan = made;
     return QUO_OK;
 }
@@ -166,9 +160,9 @@ int run_plan(const FftPlan* plan, FftDomain domain, const float* in, float* out)
     return live->run(in, out);
 }
 
-int transform_once(const Request& request, const float* in, float* out, const char* function) {
+int transform_once(const Request& request, const float* in, float* out) {
     FftPlan plan{};
-    if (const int status = make_plan(&plan, request, function)) return status;
+    if (const int status = make_plan(&plan, request)) return status;
     const int status = run_plan(&plan, request.domain, in, out);
     fft_destp_c(&plan);
     return status;
@@ -214,16 +208,16 @@ const char* fft_engine_name(void) noexcept {
     return engine ? engine->name() : "none";
 }
 
+const char* fft_engine_error(void) noexcept { return quo::fft_error(); }
+
 int fft_makep_c(FftPlan* plan, int n, int nfft, int m, int mfft, int dir_rows, int dir_cols,
                 int in_place) noexcept {
-    return make_plan(plan, {FftDomain::Complex, n, nfft, m, mfft, dir_rows, dir_cols, in_place != 0},
-                     "fft_makep_c()");
+    return make_plan(plan, {FftDomain::Complex, n, nfft, m, mfft, dir_rows, dir_cols, in_place != 0});
 }
 
 int fft_makep_r(FftPlan* plan, int n, int nfft, int m, int mfft, int dir_rows, int dir_cols,
                 int in_place) noexcept {
-    return make_plan(plan, {FftDomain::Real, n, nfft, m, mfft, dir_rows, dir_cols, in_place != 0},
-                     "fft_makep_r()");
+    return make_plan(plan, {FftDomain::Real, n, nfft, m, mfft, dir_rows, dir_cols, in_place != 0});
 }
 
 int pfft_c(const FftPlan* plan, const fcomplex* in, fcomplex* out) noexcept {
@@ -235,8 +229,7 @@ int pfft_r(const FftPlan* plan, const float* in, float* out) noexcept {
 }
 
 int fft_destp_c(FftPlan* plan) noexcept {
-    // A record that was made has sizes even where it holds no transform; one that was released has none.
-    if (!plan || plan->n < 1) return QUO_REFUSED;
+    if (!plan) return QUO_REFUSED;
     bool released = true;
     for (const FftEnginePlan* handle : {plan->rows, plan->columns})
         if (handle) released = quo::plan_store().close(handle) && released;
@@ -247,11 +240,11 @@ int fft_destp_c(FftPlan* plan) noexcept {
 int fft_c(int n, int nfft, int m, int mfft, int dir_rows, int dir_cols, const fcomplex* in,
           fcomplex* out) noexcept {
     return transform_once({FftDomain::Complex, n, nfft, m, mfft, dir_rows, dir_cols, in == out}, floats(in),
-                          floats(out), "fft_c()");
+                          floats(out));
 }
 
 int fft_r(int n, int nfft, int m, int mfft, int dir_rows, int dir_cols, const float* in, float* out) noexcept {
-    return transform_once({FftDomain::Real, n, nfft, m, mfft, dir_rows, dir_cols, in == out}, in, out, "fft_r()");
+    return transform_once({FftDomain::Real, n, nfft, m, mfft, dir_rows, dir_cols, in == out}, in, out);
 }
 
 int genpow(int n, int step) noexcept {

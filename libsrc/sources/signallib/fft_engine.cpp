@@ -7,6 +7,7 @@
 #include <string>
 
 #include "diagnosticslib/errno_kept.h"
+#include "sarutillib/bounded_text.h"
 
 #if defined(__x86_64__) || defined(__i386__)
 #include <cpuid.h>
@@ -54,6 +55,9 @@ FftEngine* fftw() { return load_fftw_engine(setting("QUO_FFTW_MODULE")); }
 
 FftEngine* chosen = nullptr;
 
+/** Of each thread, as errno is: the plans of two threads may fail at the same time. */
+thread_local char error_text[512];
+
 }  // namespace
 
 FftEngine* load_fftw_engine(const char* file) noexcept try {
@@ -83,5 +87,29 @@ FftEngine* fft_engine() noexcept {
 }
 
 void forget_fft_engine() noexcept { chosen = nullptr; }
+
+void forget_fft_error() noexcept { error_text[0] = '\0'; }
+
+void note_no_fft_engine() noexcept {
+    copy_bounded(
+        error_text,
+        "no FFT engine can be loaded: install libquo_base_fftw.so beside the library in quo_base/, or name "
+        "it in QUO_FFTW_MODULE; or install MKL (libmkl_rt.so, in Debian the package libmkl-rt), or name it "
+        "in QUO_MKL_LIBRARY. QUO_FFT_ENGINE chooses: auto, mkl or fftw");
+}
+
+void note_fft_error(const FftEngine& engine, int length, const FftFailure& why) noexcept {
+    constexpr std::size_t kMebibyte = std::size_t{1} << 20;
+    if (why.bytes != 0) {
+        format_bounded(error_text, sizeof error_text,
+                       "%s: not enough memory for transforms of length %d, which may take %zu MiB", engine.name(),
+                       length, why.bytes / kMebibyte + (why.bytes % kMebibyte != 0 ? 1 : 0));
+    } else {
+        format_bounded(error_text, sizeof error_text, "%s: transforms of length %d are refused, status %ld",
+                       engine.name(), length, why.code);
+    }
+}
+
+const char* fft_error() noexcept { return error_text; }
 
 }  // namespace quo

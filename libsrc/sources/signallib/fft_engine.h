@@ -26,6 +26,12 @@ struct FftGeometry {
 /** Floats of a sample. */
 constexpr std::ptrdiff_t floats_of(FftDomain domain) { return domain == FftDomain::Complex ? 2 : 1; }
 
+/** Why an engine could not do what it was asked for. */
+struct FftFailure {
+    std::size_t bytes = 0;  ///< memory that was needed and is not there; 0 for another cause
+    long code = 0;          ///< what the engine's library answered; 0 where it gives no reason
+};
+
 /** A batch made ready by an engine. */
 class FftBatch {
 public:
@@ -35,8 +41,8 @@ public:
     virtual ~FftBatch() = default;
 
     /** Transforms unscaled, from `in` to `out`: the same for a batch in place, apart otherwise, aligned as floats
-     * at least. False when the engine failed. */
-    virtual bool run(const float* in, float* out) noexcept = 0;
+     * at least. False when the engine failed, which fills `why`. */
+    virtual bool run(const float* in, float* out, FftFailure& why) noexcept = 0;
 };
 
 /** What computes the transforms. Loaded at run time, lives until the process ends. */
@@ -50,15 +56,16 @@ public:
     [[nodiscard]] virtual const char* name() const noexcept = 0;
     /** Columns of so many rows and more are faster through a tile of neighbouring columns. */
     [[nodiscard]] virtual int tiled_from() const noexcept = 0;
-    /** Null when the batch cannot be had. Takes memory of its own to measure on. */
-    [[nodiscard]] virtual std::unique_ptr<FftBatch> make(const FftGeometry& geometry) noexcept = 0;
+    /** Null when the batch cannot be had, which fills `why`. Takes memory of its own to measure on. */
+    [[nodiscard]] virtual std::unique_ptr<FftBatch> make(const FftGeometry& geometry,
+                                                         FftFailure& why) noexcept = 0;
 };
 
 // ---- The FFTW engine: a module of its own, which alone holds FFTW ----
 
 /** The module's only exported function. Null for another version of the interface than its own. */
 using FftwEntry = FftEngine* (*)(int interface_version);
-inline constexpr int kFftInterfaceVersion = 1;
+inline constexpr int kFftInterfaceVersion = 2;
 inline constexpr const char* kFftwEntryName = "quo_base_fftw_engine";
 
 /** Loads the module: from `file`, or where that is null from the folder of this library, quo_base/ below it first.
@@ -83,6 +90,13 @@ struct EngineOrder {
 /** The engine of the process, chosen at the first call; null where none can be loaded. As long as there is none,
  * each call tries again. */
 [[nodiscard]] FftEngine* fft_engine() noexcept;
+
+/** What fft_engine_error() tells this thread: nothing, that no engine can be loaded, or why `engine` could not do
+ * with transforms of a length. */
+void forget_fft_error() noexcept;
+void note_no_fft_engine() noexcept;
+void note_fft_error(const FftEngine& engine, int length, const FftFailure& why) noexcept;
+[[nodiscard]] const char* fft_error() noexcept;
 
 /** Lets the next plan choose anew. Plans at hand keep their engine. For tests. */
 void forget_fft_engine() noexcept;

@@ -6,6 +6,7 @@
 #include <tuple>
 
 #include "quo_base/fft.h"
+#include "signallib/memory_room.h"
 
 namespace quo {
 namespace {
@@ -38,17 +39,35 @@ FftGeometry with_count(FftGeometry geometry, int count) {
     return geometry;
 }
 
-/** The engine's plans for whole blocks and for what is left at the end. */
-struct BlockBatches {
-    BlockBatches(FftEngine& engine, const FftGeometry& block, int total) : whole{engine.make(block)} {
+/** The engine's plans for whole blocks and for what is left at the end. Tells the thread why they fail. */
+class BlockBatches {
+public:
+    BlockBatches(FftEngine& engine, const FftGeometry& block, int total) : engine_{engine}, block_{block} {
         const int left = total % block.count;
-        if (left != 0) rest = engine.make(with_count(block, left));
-        ready = whole && (left == 0 || rest);
+        ready_ = make(whole_, block) && (left == 0 || make(rest_, with_count(block, left)));
     }
-    [[nodiscard]] FftBatch& of(int count, int block) const { return count == block ? *whole : *rest; }
+    [[nodiscard]] bool ready() const { return ready_; }
 
-    std::unique_ptr<FftBatch> whole, rest;
-    bool ready = false;
+    /** Whole blocks, or as many transforms as are left at the end. */
+    [[nodiscard]] bool run(int count, const float* in, float* out) const noexcept {
+        FftFailure why;
+        if ((count == block_.count ? *whole_ : *rest_).run(in, out, why)) return true;
+        note_fft_error(engine_, block_.length, why);
+        return false;
+    }
+
+private:
+    [[nodiscard]] bool make(std::unique_ptr<FftBatch>& batch, const FftGeometry& geometry) {
+        FftFailure why;
+        batch = engine_.make(geometry, why);
+        if (!batch) note_fft_error(engine_, geometry.length, why);
+        return batch != nullptr;
+    }
+
+    FftEngine& engine_;
+    FftGeometry block_;
+    std::unique_ptr<FftBatch> whole_, rest_;
+    bool ready_ = false;
 };
 
 /** Runs blocks where they lie. */
@@ -56,14 +75,14 @@ class BlockedTransform final : public FftTransform {
 public:
     BlockedTransform(FftEngine& engine, const FftGeometry& geometry, int block)
         : FftTransform{geometry, block}, batches_{engine, with_count(geometry, block), geometry.count} {}
-    [[nodiscard]] bool ready() const { return batches_.ready; }
+    [[nodiscard]] bool ready() const { return batches_.ready(); }
     [[nodiscard]] std::size_t held_bytes() const noexcept override { return 0; }
 
     bool run(const float* in, float* out, int first, int count, FftFactors factors) noexcept override {
         for (int k = first; k < first + count; k += block_) {
             const int width = std::min(block_, geometry_.count - k);
             const auto offset = k * geometry_.distance * floats_of(geometry_.domain);
-            if (!batches_.of(width, block_).run(in + offset, out + offset)) return false;
+            if (!batches_.run(width, in + offset, out + offset)) return false;
             multiply(out + offset, width, factors);
         }
         return true;
@@ -92,15 +111,19 @@ public:
         : FftTransform{columns, std::min(width, columns.count)},
           batches_{engine, tile_geometry(columns, block_), columns.count},
           bytes_{static_cast<std::size_t>(columns.length * tile_pitch(block_)) * 2 * sizeof(float)},
-          tile_{static_cast<float*>(fft_malloc(bytes_)), &fft_free} {}
-    [[nodiscard]] bool ready() const { return batches_.ready && tile_; }
+          tile_{nullptr, &fft_free} {
+        if (!batches_.ready()) return;
+        if (has_room({bytes_, bytes_})) tile_.reset(static_cast<float*>(fft_malloc(bytes_)));
+        if (!tile_) note_fft_error(engine, columns.length, {.bytes = bytes_});
+    }
+    [[nodiscard]] bool ready() const { return tile_ != nullptr; }
     [[nodiscard]] std::size_t held_bytes() const noexcept override { return bytes_; }
 
     bool run(const float* in, float* out, int first, int count, FftFactors factors) noexcept override {
         for (int k = first; k < first + count; k += block_) {
             const int width = std::min(block_, geometry_.count - k);
             fill(in + 2 * std::ptrdiff_t{k}, width);
-            if (!batches_.of(width, block_).run(tile_.get(), tile_.get())) return false;
+            if (!batches_.run(width, tile_.get(), tile_.get())) return false;
             multiply_rows(tile_.get(), geometry_.length, 2 * std::ptrdiff_t{width}, pitch(), factors);
             empty(out + 2 * std::ptrdiff_t{k}, width);
         }

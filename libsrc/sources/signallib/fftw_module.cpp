@@ -9,13 +9,16 @@
 #include <utility>
 
 #include "signallib/fft_engine.h"
+#include "signallib/memory_room.h"
 
 namespace {
 
 using quo::FftBatch;
 using quo::FftDomain;
 using quo::FftEngine;
+using quo::FftFailure;
 using quo::FftGeometry;
+using quo::MemoryNeed;
 
 /** Ends measuring at very long transforms; the batches that are asked for are measured well within it. */
 constexpr double kPlanningSeconds = 10.0;
@@ -53,14 +56,60 @@ Floats allocate(std::size_t floats) noexcept {
     return Floats{static_cast<float*>(std::aligned_alloc(kAlignment, bytes / kAlignment * kAlignment))};
 }
 
+/** FFTW ends the process when an allocation of its own fails, while it plans and while it runs: what it may take
+ * is looked for before. These bounds were measured, on lengths of all kinds and batches of all shapes: the most
+ * that was found is three quarters of them. Great prime factors cost several longer transforms. */
+class FftwAppetite {
+public:
+    explicit FftwAppetite(const FftGeometry& geometry) noexcept
+        : one_{2 * sizeof(float) * static_cast<std::size_t>(geometry.length)},
+          batch_{one_ * static_cast<std::size_t>(geometry.count)},
+          smooth_{is_smooth(geometry.length)} {}
+
+    /** Samples of the whole batch, bytes. */
+    [[nodiscard]] std::size_t batch() const noexcept { return batch_; }
+    [[nodiscard]] std::size_t planning() const noexcept {
+        return (smooth_ ? 3 : 8) * one_ + 3 * buffered() + (std::size_t{1} << 20);
+    }
+    [[nodiscard]] std::size_t running() const noexcept { return (smooth_ ? 2 : 5) * one_ + 2 * buffered() + 4096; }
+
+private:
+    /** No more of a batch than this goes through buffers at once. */
+    static constexpr std::size_t kMostBuffered = std::size_t{32} << 20;
+    [[nodiscard]] std::size_t buffered() const noexcept { return std::min(batch_, kMostBuffered); }
+    static bool is_smooth(int length) noexcept {
+        for (const int prime : {2, 3, 5, 7, 11, 13})
+            while (length % prime == 0) length /= prime;
+        return length == 1;
+    }
+
+    std::size_t one_, batch_;
+    bool smooth_;
+};
+
+/** False where memory is short, which `why` then tells. */
+bool has_room_for(const MemoryNeed& need, FftFailure& why) noexcept {
+    if (quo::has_room(need)) return true;
+    why.bytes = need.touched;
+    return false;
+}
+
 /** Measured on scratch memory, since measuring overwrites it. Estimating instead would cost a strided batch a
  * factor of ten. */
-Plan measure(const FftGeometry& geometry, unsigned flags) noexcept {
+Plan measure(const FftGeometry& geometry, unsigned flags, FftFailure& why) noexcept {
     const auto last = (geometry.length - 1) * geometry.stride + (geometry.count - 1) * geometry.distance;
     const auto floats = 2 * (static_cast<std::size_t>(last) + 1);
+    const FftwAppetite fftw{geometry};
+    const std::size_t scratches = geometry.in_place ? 1 : 2;
+    const MemoryNeed need{scratches * floats * sizeof(float) + fftw.planning(),
+                          scratches * fftw.batch() + fftw.planning()};
+    if (!has_room_for(need, why)) return {};
     const Floats in = allocate(floats);
     const Floats apart = geometry.in_place ? nullptr : allocate(floats);
-    if (!in || (!geometry.in_place && !apart)) return {};
+    if (!in || (!geometry.in_place && !apart)) {
+        why.bytes = need.touched;
+        return {};
+    }
     auto* const from = reinterpret_cast<fftwf_complex*>(in.get());
     auto* const to = geometry.in_place ? from : reinterpret_cast<fftwf_complex*>(apart.get());
     const fftwf_iodim64 transform{geometry.length, geometry.stride, geometry.stride};
@@ -72,17 +121,17 @@ Plan measure(const FftGeometry& geometry, unsigned flags) noexcept {
 
 class ComplexBatch final : public FftBatch {
 public:
-    explicit ComplexBatch(const FftGeometry& geometry) noexcept
-        : geometry_{geometry}, aligned_{measure(geometry, 0)} {}
+    ComplexBatch(const FftGeometry& geometry, FftFailure& why) noexcept
+        : geometry_{geometry}, running_{FftwAppetite{geometry}.running()}, aligned_{measure(geometry, 0, why)} {}
     [[nodiscard]] bool ready() const noexcept { return static_cast<bool>(aligned_); }
 
-    bool run(const float* in, float* out) noexcept override {
+    bool run(const float* in, float* out, FftFailure& why) noexcept override {
         float* const from = const_cast<float*>(in);  // kept by transforms that are not in place
         const bool aligned = fftwf_alignment_of(from) == 0 && fftwf_alignment_of(out) == 0;
         // Few callers need the slower plan for samples that start between two vectors: it is made for the first.
-        if (!aligned && !unaligned_) unaligned_ = measure(geometry_, FFTW_UNALIGNED);
+        if (!aligned && !unaligned_) unaligned_ = measure(geometry_, FFTW_UNALIGNED, why);
         const Plan& plan = aligned ? aligned_ : unaligned_;
-        if (!plan) return false;
+        if (!plan || !has_room_for({running_, running_}, why)) return false;
         fftwf_execute_dft(plan.get(), reinterpret_cast<fftwf_complex*>(from),
                           reinterpret_cast<fftwf_complex*>(out));
         return true;
@@ -90,6 +139,7 @@ public:
 
 private:
     FftGeometry geometry_;
+    std::size_t running_;
     Plan aligned_, unaligned_;
 };
 
@@ -97,18 +147,24 @@ private:
  * values on the other, which FFTW does not pack. */
 class RealBatch final : public FftBatch {
 public:
-    explicit RealBatch(const FftGeometry& geometry) noexcept
+    RealBatch(const FftGeometry& geometry, FftFailure& why) noexcept
         : geometry_{geometry},
           length_{static_cast<std::size_t>(geometry.length)},
           pitch_{(length_ + 2 + 15) / 16 * 16},
-          group_{geometry.stride == 1 ? 1 : std::min(kGroup, geometry.count)},
-          samples_{allocate(pitch_ * static_cast<std::size_t>(group_))},
-          spectrum_{allocate(pitch_)} {
+          group_{geometry.stride == 1 ? 1 : std::min(kGroup, geometry.count)} {
+        const std::size_t groups = pitch_ * static_cast<std::size_t>(group_);
+        const std::size_t need = (groups + pitch_) * sizeof(float) + appetite().planning();
+        if (!has_room_for({need, need}, why)) return;
+        samples_ = allocate(groups);
+        spectrum_ = allocate(pitch_);
         if (samples_ && spectrum_) plan_ = measure_one();
+        if (!samples_ || !spectrum_) why.bytes = need;
     }
     [[nodiscard]] bool ready() const noexcept { return static_cast<bool>(plan_); }
 
-    bool run(const float* in, float* out) noexcept override {
+    bool run(const float* in, float* out, FftFailure& why) noexcept override {
+        const std::size_t running = appetite().running();
+        if (!has_room_for({running, running}, why)) return false;
         for (int first = 0; first < geometry_.count; first += group_) {
             const int width = std::min(group_, geometry_.count - first);
             const auto offset = first * geometry_.distance;
@@ -121,6 +177,13 @@ public:
 
 private:
     static constexpr int kGroup = 16;  // a cache line of neighbouring columns
+
+    /** Of one transform at a time. */
+    [[nodiscard]] FftwAppetite appetite() const noexcept {
+        FftGeometry one = geometry_;
+        one.count = 1;
+        return FftwAppetite{one};
+    }
 
     [[nodiscard]] Plan measure_one() noexcept {
         auto* const half = reinterpret_cast<fftwf_complex*>(spectrum_.get());
@@ -170,8 +233,9 @@ private:
 };
 
 template <typename Batch>
-std::unique_ptr<FftBatch> make_batch(const FftGeometry& geometry) noexcept {
-    std::unique_ptr<Batch> batch{new (std::nothrow) Batch{geometry}};
+std::unique_ptr<FftBatch> make_batch(const FftGeometry& geometry, FftFailure& why) noexcept {
+    std::unique_ptr<Batch> batch{new (std::nothrow) Batch{geometry, why}};
+    if (!batch) why.bytes = sizeof(Batch);
     if (!batch || !batch->ready()) return nullptr;
     return batch;
 }
@@ -181,9 +245,9 @@ public:
     [[nodiscard]] const char* name() const noexcept override { return "fftw"; }
     // Shorter columns fit the cache as they lie.
     [[nodiscard]] int tiled_from() const noexcept override { return 256; }
-    [[nodiscard]] std::unique_ptr<FftBatch> make(const FftGeometry& geometry) noexcept override {
-        return geometry.domain == FftDomain::Real ? make_batch<RealBatch>(geometry)
-                                                  : make_batch<ComplexBatch>(geometry);
+    [[nodiscard]] std::unique_ptr<FftBatch> make(const FftGeometry& geometry, FftFailure& why) noexcept override {
+        return geometry.domain == FftDomain::Real ? make_batch<RealBatch>(geometry, why)
+                                                  : make_batch<ComplexBatch>(geometry, why);
     }
 };
 

@@ -72,9 +72,9 @@ void interpolate_linearly(const Real* in, std::ptrdiff_t outer, std::ptrdiff_t a
 template <typename Real>
 int grow_linearly(quo::CallFrame& frame, const Real* in, int nx_in, int ny_in, int nx_out, int ny_out, Real* out,
                   int parts) {
+    if (nx_out <= nx_in && ny_out <= ny_in) return frame.success();
     if (!in || !out || !quo::addressable<dcomplex>(nx_in, ny_in) || !quo::addressable<dcomplex>(nx_out, ny_out))
         return frame.fail(QUO_REFUSED, kNoImage);
-    if (nx_out <= nx_in && ny_out <= ny_in) return frame.success();
     if (nx_in != nx_out && ny_in != ny_out) return frame.fail(QUO_REFUSED, kBothAxes);
     const auto row = std::ptrdiff_t{nx_in} * parts;
     if (ny_out > ny_in) interpolate_linearly<Real>(in, 1, ny_in, row, ny_out / ny_in, out, 0);
@@ -90,6 +90,7 @@ interp::~interp() { destroyplans(); }
 int interp::setplans(int nx_in, int ny_in, int nx_out, int ny_out) {
     quo::CallFrame frame{"interp::setplans", kSource};
     destroyplans();
+    resetplans();
     if (nx_in != nx_out && ny_in != ny_out) return frame.fail(QUO_REFUSED, kBothAxes);
     if (!quo::addressable<fcomplex>(nx_in, ny_in) || !quo::addressable<fcomplex>(nx_out, ny_out))
         return frame.fail(QUO_REFUSED, kNoImage);
@@ -98,6 +99,7 @@ int interp::setplans(int nx_in, int ny_in, int nx_out, int ny_out) {
     ny_in_ = ny_in;
     if (const int status = open_plans(nx_out, ny_out)) {
         destroyplans();
+        resetplans();
         return frame.callee(status);
     }
     nx_out_ = nx_out;
@@ -113,9 +115,8 @@ int interp::open_plans(int nx_out, int ny_out) {
 }
 
 int interp::destroyplans() {
-    fft_destp_c(&forward_);  // refuses what was not made
+    fft_destp_c(&forward_);
     fft_destp_c(&inverse_);
-    resetplans();
     return QUO_OK;
 }
 

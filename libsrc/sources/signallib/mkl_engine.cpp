@@ -5,8 +5,10 @@
 #include <map>
 #include <new>
 #include <type_traits>
+#include <utility>
 
 #include "signallib/fft_engine.h"
+#include "signallib/memory_room.h"
 
 namespace quo {
 namespace {
@@ -56,45 +58,62 @@ public:
         if (descriptor_) dfti_.free(&descriptor_);
     }
 
-    [[nodiscard]] bool commit() {
+    /** 0, or what DFTI answered. */
+    [[nodiscard]] MklLong commit() {
         const bool real = geometry_.domain == FftDomain::Real;
-        if (dfti_.create(&descriptor_, kSingle, real ? kReal : kComplex, 1L, MklLong{geometry_.length}) != 0) {
+        if (const MklLong status =
+                dfti_.create(&descriptor_, kSingle, real ? kReal : kComplex, 1L, MklLong{geometry_.length})) {
             descriptor_ = nullptr;
-            return false;
+            return status;
         }
         // Older versions do not know the limit; the layer is sequential anyhow unless the host chose another
         // first.
         dfti_.set(descriptor_, kThreadLimit, MklLong{1});
-        return (!real || set_packed()) && set_layout() && dfti_.commit(descriptor_) == 0;
+        MklLong status = real ? set_packed() : 0;
+        if (status == 0) status = set_layout();
+        return status == 0 ? dfti_.commit(descriptor_) : status;
     }
 
-    bool run(const float* in, float* out) noexcept override {
+    bool run(const float* in, float* out, FftFailure& why) noexcept override {
         auto* const compute = geometry_.forward ? dfti_.forward : dfti_.backward;
         void* const from = const_cast<float*>(in);  // written where it is `out`, read only otherwise
-        return (geometry_.in_place ? compute(descriptor_, from)
-                                   : compute(descriptor_, from, static_cast<void*>(out))) == 0;
+        why.code =
+            geometry_.in_place ? compute(descriptor_, from) : compute(descriptor_, from, static_cast<void*>(out));
+        return why.code == 0;
     }
 
 private:
-    [[nodiscard]] bool set_packed() const {
-        return dfti_.set(descriptor_, kConjugateEvenStorage, kComplexReal) == 0 &&
-               dfti_.set(descriptor_, kPackedFormat, kPackFormat) == 0;
+    /** The first answer that is not 0, or 0. */
+    template <typename... Values>
+    [[nodiscard]] MklLong set_all(std::pair<Parameter, Values>... settings) const {
+        MklLong status = 0;
+        (void)(((status = dfti_.set(descriptor_, settings.first, settings.second)) == 0) && ...);
+        return status;
     }
-    [[nodiscard]] bool set_layout() const {
+    [[nodiscard]] MklLong set_packed() const {
+        return set_all(std::pair{kConjugateEvenStorage, int{kComplexReal}},
+                       std::pair{kPackedFormat, int{kPackFormat}});
+    }
+    [[nodiscard]] MklLong set_layout() const {
         std::array<MklLong, 2> strides{0, static_cast<MklLong>(geometry_.stride)};
         const auto distance = static_cast<MklLong>(geometry_.distance);
-        return dfti_.set(descriptor_, kPlacement, geometry_.in_place ? kInPlace : kNotInPlace) == 0 &&
-               dfti_.set(descriptor_, kNumberOfTransforms, MklLong{geometry_.count}) == 0 &&
-               dfti_.set(descriptor_, kInputStrides, strides.data()) == 0 &&
-               dfti_.set(descriptor_, kOutputStrides, strides.data()) == 0 &&
-               dfti_.set(descriptor_, kInputDistance, distance) == 0 &&
-               dfti_.set(descriptor_, kOutputDistance, distance) == 0;
+        return set_all(std::pair{kPlacement, int{geometry_.in_place ? kInPlace : kNotInPlace}},
+                       std::pair{kNumberOfTransforms, MklLong{geometry_.count}},
+                       std::pair{kInputStrides, strides.data()}, std::pair{kOutputStrides, strides.data()},
+                       std::pair{kInputDistance, distance}, std::pair{kOutputDistance, distance});
     }
 
     const Dfti& dfti_;
     FftGeometry geometry_;
     Descriptor descriptor_ = nullptr;
 };
+
+/** The tables and buffers of a long transform whose length has great prime factors, and as much again. */
+MemoryNeed most_memory(const FftGeometry& geometry) {
+    constexpr std::size_t kTimesLength = 10;
+    const std::size_t bytes = kTimesLength * 2 * sizeof(float) * static_cast<std::size_t>(geometry.length);
+    return {bytes, bytes};
+}
 
 class MklEngine final : public FftEngine {
 public:
@@ -114,9 +133,12 @@ public:
     [[nodiscard]] const char* name() const noexcept override { return "mkl"; }
     // Shorter columns it blocks better by itself.
     [[nodiscard]] int tiled_from() const noexcept override { return 4096; }
-    [[nodiscard]] std::unique_ptr<FftBatch> make(const FftGeometry& geometry) noexcept override {
-        std::unique_ptr<MklBatch> batch{new (std::nothrow) MklBatch{dfti_, geometry}};
-        if (!batch || !batch->commit()) return nullptr;
+    [[nodiscard]] std::unique_ptr<FftBatch> make(const FftGeometry& geometry, FftFailure& why) noexcept override {
+        // MKL answers when memory is short, but not where the system promises more than it has.
+        const MemoryNeed need = most_memory(geometry);
+        std::unique_ptr<MklBatch> batch{has_room(need) ? new (std::nothrow) MklBatch{dfti_, geometry} : nullptr};
+        why.bytes = batch ? 0 : need.touched;
+        if (!batch || (why.code = batch->commit()) != 0) return nullptr;
         return batch;
     }
 

@@ -1,0 +1,43 @@
+#!/bin/sh
+# Builds the fuzz targets and runs each from its seeds for so many seconds. Fails for a target that crashes, leaks or
+# hangs, and for one whose coverage does not grow beyond that of its seeds: it would be looking at nothing. An input
+# that was found to fail is kept in build/fuzz/found.
+# Usage: scripts/fuzz.sh SECONDS [BUILT_TARGET...], which without targets builds and takes all
+set -eu
+[ $# -ge 1 ] || { echo "Usage: scripts/fuzz.sh SECONDS [BUILT_TARGET...]" >&2; exit 2; }
+cd "$(dirname "$0")/.."
+seconds=$1
+shift
+if [ $# -eq 0 ]; then
+    scripts/build.sh fuzz fuzz_targets
+    set -- build/fuzz/fuzz/*_fuzz
+fi
+work=$(mktemp -d)
+trap 'rm -rf "$work"' EXIT
+mkdir -p build/fuzz/found
+
+# The branches that were reached by the time of a line of the log: INITED, after the seeds, or DONE.
+covered() {
+    sed -n "s/^#[0-9]*[[:space:]]*$1[[:space:]].*cov: \([0-9]*\).*/\1/p" "$2" | tail -n 1
+}
+
+failed=0
+for target in "$@"; do
+    name=$(basename "$target" _fuzz)
+    log=$work/$name.log
+    mkdir "$work/$name"
+    verdict=fine
+    "$target" -max_total_time="$seconds" -timeout=10 -rss_limit_mb=1024 -artifact_prefix="build/fuzz/found/$name-" \
+        "$work/$name" "fuzz/corpus/$name" >"$log" 2>&1 || verdict="FAILED, ended with status $?"
+    seeds=$(covered INITED "$log")
+    reached=$(covered DONE "$log")
+    if [ "$verdict" = fine ] && [ "${reached:-0}" -le "${seeds:-0}" ]; then
+        verdict="FAILED, its coverage did not grow"
+    fi
+    echo "$name: $verdict; branches: ${seeds:-none} from the seeds, ${reached:-none} in the end"
+    if [ "$verdict" != fine ]; then
+        failed=1
+        tail -n 60 "$log" >&2
+    fi
+done
+exit $failed
