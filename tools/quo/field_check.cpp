@@ -8,12 +8,13 @@ namespace tool {
 namespace {
 
 bool is_unknown(const parElement& fresh, int index, std::string_view text) {
-    if (fresh.type == parElement::typeString && text == "NOT_AVAILABLE") return true;
-    if (index >= fresh.count) return false;
-    const std::string mark = value_text(fresh, index);
-    if (fresh.type == parElement::typeString) return text == mark;
+    constexpr double kUnknown = -999.0;
+    const bool known = index < fresh.count;
+    if (fresh.type == parElement::typeString)
+        return text == "NOT_AVAILABLE" || (known && text == value_text(fresh, index));
     const auto number = finite_number(text);
-    return number && number == finite_number(mark);
+    if (number == kUnknown && fresh.type != parElement::typeInt) return true;
+    return number && known && number == finite_number(value_text(fresh, index));
 }
 
 }  // namespace

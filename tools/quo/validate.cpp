@@ -126,8 +126,7 @@ private:
         return static_cast<std::size_t>(document.count(path));
     }
 
-    // Every value must make sense by the rules of its field. Values that still are what a new object has mark what
-    // is unknown.
+    // Every value must make sense by the rules of its field.
     void check_values() {
         for (int i = gsRoi; i < GeneralSAR::kObjects; ++i) {
             const auto object = static_cast<GSObject>(i);
