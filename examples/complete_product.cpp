@@ -9,6 +9,7 @@
 #include <string>
 #include <vector>
 
+#include "common/apart.h"
 #include "quo_base/generalSAR.h"
 
 namespace {
@@ -218,6 +219,7 @@ void write(GeneralSAR& product, const std::vector<fcomplex>& image, const std::s
 }
 
 int run(const char* scene_header, const std::string& raster) {
+    example::require_apart({{scene_header}, {raster, raster + ".hdr"}});
     GeneralSAR scene, product;
     require(scene.GSread(scene_header) == 0 && scene.GSexists(gsOrbit), "the scene cannot be read");
     take_over(scene, product);

@@ -6,6 +6,7 @@
 #include <stdexcept>
 #include <string>
 
+#include "apart.h"
 #include "quo_base/ckerr.h"
 #include "quo_base/quorelReport.h"
 
@@ -50,10 +51,15 @@ public:
 };
 
 /** Runs a program's job under a report, and returns the program's exit status. What the job throws becomes an
- * entry of the report and a line on the standard error stream. */
+ * entry of the report and a line on the standard error stream. `files` are those that the job reads and writes;
+ * nothing is opened unless they are apart, report and log included. */
 template <typename Job>
-int run_program(const char* title, const std::string& report, const std::string& log, int level, Job&& job) {
+int run_program(const char* title, Files files, const std::string& report, const std::string& log, int level,
+                Job&& job) {
     try {
+        files.written.push_back(report);
+        if (!log.empty()) files.written.push_back(log);
+        require_apart(files);
         const Session session{title, report, log, level};
         try {
             job();
@@ -64,7 +70,7 @@ int run_program(const char* title, const std::string& report, const std::string&
         } catch (const std::exception& failure) {
             quorelReport::addEntry(QUO_ERROR, __LINE__, __FILE__, title, "%s", failure.what());
         }
-    } catch (const Failure& failure) {
+    } catch (const std::exception& failure) {
         std::fprintf(stderr, "%s: %s\n", title, failure.what());
     }
     return 1;

@@ -40,7 +40,8 @@ int main(int argc, char** argv) {
     std::string targets;
     add_options(app, job, targets);
     CLI11_PARSE(app, argc, argv);
-    return example::run_program("Echo simulator", job.raster + ".report.txt", "", 1, [&] {
+    const example::Files files{{job.scene, targets}, {job.raster, job.raster + ".hdr"}};
+    return example::run_program("Echo simulator", files, job.raster + ".report.txt", "", 1, [&] {
         job.targets = example::read_targets(targets);
         const example::EchoRaster raster = example::simulate_echoes(job);
         std::printf("%s: echoes of %zu targets in %d lines of %d samples\n", job.raster.c_str(),

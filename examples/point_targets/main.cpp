@@ -14,7 +14,8 @@ int main(int argc, char** argv) {
     app.add_option("targets", targets, "Table of targets: name,latitude_deg,longitude_deg,height_m,strength")
         ->required();
     CLI11_PARSE(app, argc, argv);
-    return example::run_program("Point targets", image + ".targets.report.txt", "", 1, [&] {
+    const example::Files files{{image, image + ".hdr", targets}, {}};
+    return example::run_program("Point targets", files, image + ".targets.report.txt", "", 1, [&] {
         const auto found = example::measure(image, example::read_targets(targets));
         example::print_table(stdout, found);
         if (!std::all_of(found.begin(), found.end(), example::within_bounds))

@@ -119,7 +119,7 @@ void Processor::compress_range() {
     data_.SetSlowAxe(product_.roi.Roi.SlowStartTime, 1.0 / band_.prf_hz, lines);
     data_.SetFastAxe(product_.roi.Roi.FastStartTime + compression.delay_s(), product_.roi.Roi.FastTimeDelta,
                      compression.samples());
-    describe(compressed_, job_.image + ".rc", lines, data_.Samples);
+    describe(compressed_, compressed_raster(job_), lines, data_.Samples);
     create(compressed_);
     product_.bufferFile.open(BufferFile::READ);
     for (int first = 0; first < lines; first += block_lines) {

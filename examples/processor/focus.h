@@ -23,6 +23,9 @@ struct FocusResult {
     Stopwatch stopwatch;
 };
 
+/** The intermediate raster of a job. */
+inline std::string compressed_raster(const FocusJob& job) { return job.image + ".rc"; }
+
 /** Focuses stripmap data: range compression of whole lines into an intermediate raster "<image>.rc", then azimuth
  * focusing of that in blocks which overlap. The image is in slant range and zero-Doppler time, on the grid of the
  * raw data; a target of amplitude 1 in the raw data has amplitude 1 in the image, and the phase -4 pi R / lambda.

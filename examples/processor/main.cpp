@@ -55,7 +55,10 @@ int main(int argc, char** argv) {
     AzimuthConf azimuth;
     generalProcessingConf processing;
     const std::string report = job.image + ".report.txt", log = job.image + ".log.txt";
-    return example::run_program("Processor", report, log, processing.ReportLevel, [&] {
+    const std::string compressed = example::compressed_raster(job);
+    const example::Files files{{job.raw, job.raw + ".hdr", configuration},
+                               {job.image, job.image + ".hdr", compressed}};
+    return example::run_program("Processor", files, report, log, processing.ReportLevel, [&] {
         if (!configuration.empty()) {
             azimuth.readpar(configuration.c_str(), 1);
             processing.readpar(configuration.c_str(), 1);

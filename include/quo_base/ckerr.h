@@ -108,6 +108,12 @@ QUO_BASE_API void quo_add_report(const char* message, int kind, int line, const 
  * left to the caller. */
 QUO_BASE_API void quo_check(int error_number, int line, const char* function, const char* file) QUO_NOEXCEPT;
 
+/** Why the system refused what a function of the library could not do, for a message about it: ask once before the
+ * call, to forget what is older, and again when its status is not 0.
+ * @return the number that was last given to quo_check() since this was asked before, whether or not a report is
+ * open; 0 where there was none */
+QUO_BASE_API int quo_take_system_error(void) QUO_NOEXCEPT;
+
 /** Writes a numbered line into the log, after an empty one, and flushes it. The level is not looked at.
  * @return 0, or EOF if the log is not open or could not be written */
 QUO_BASE_API int quo_add_log(const char* text) QUO_NOEXCEPT;

@@ -9,6 +9,7 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <span>
 #include <string>
 #include <string_view>
 
@@ -75,6 +76,9 @@ public:
     int write() noexcept;
     /** Drops the document; safe to call repeatedly. Returns 0. */
     int clean() noexcept;
+    /** What is no XML in a file, the first place of it: "line 17: ..."; empty where all of it is, or cannot be
+     * read. Throws bad_alloc. */
+    static std::string xmlDefect(const char* file_name);
 
     /** Reads `count` values of a field into the caller's array.
      *
@@ -194,6 +198,24 @@ public:
     int initXmlFile(const char* file_name, const char* stylesheet) noexcept;
 };
 
+/** Which values of an element make sense, where its type and its bounds do not tell it all. */
+struct parRule {
+    /** What a text has to be. */
+    enum Text : std::uint8_t {
+        anyText,
+        filledText,  ///< not empty
+        listedText,  ///< one of `texts`
+        dateText     ///< what date2str() reads
+    };
+
+    bool bounded = false;       ///< whether `lowest` and `highest` take the place of the element's bounds
+    bool above_lowest = false;  ///< whether `lowest` itself is left out
+    double lowest = 0.0;        ///< the lowest number, in the element's unit
+    double highest = 0.0;       ///< the highest number; may be infinite
+    Text text = anyText;        ///< for elements that hold texts
+    std::span<const std::string_view> texts = {};  ///< not owned
+};
+
 /** One member of a header object: where it lives and how it appears in a header file. */
 class QUO_BASE_API parElement {
 public:
@@ -214,10 +236,18 @@ public:
     bool registered = false;        ///< set after the first registration; `scalar` is fixed from then on
     std::size_t room = kTextRoom;   ///< room of each text
     bool text_array = false;        ///< `pointer` is an array of texts, whatever the count
+    parRule rule;                   ///< for defect() alone; reading and writing do not look at it
 
     /** Describes the element anew. Before the first registration a count of 1 makes it a scalar. Returns 0. */
     int setElement(const char* element_name, void* values, ParameterType value_type, std::int32_t value_count,
                    double lowest, double highest, bool is_mandatory) noexcept;
+    /** What is wrong with one value of the element, given as the text that stands in a header: "17 lies above 1";
+     * empty where it makes sense. Numbers must be whole texts, finite, and within the rule's bounds, else the
+     * element's own; texts must fit their room and meet the rule. Marks of unknown values (-999) are judged like
+     * any other value. Throws bad_alloc. */
+    std::string defect(std::string_view text) const;
+    /** The same for the number of values: "has 3 values, not 1". Any number is right while `count` is 0. */
+    std::string countDefect(std::size_t values) const;
 };
 
 /** Registry base of the header objects: one table of elements drives reading and writing.

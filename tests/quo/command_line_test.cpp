@@ -80,6 +80,9 @@ TEST_P(WrongUse, IsRefusedInOneLineWithStatusTwo) {
     EXPECT_EQ(refused.out, "");
     ASSERT_EQ(refused.messages().size(), 1U) << refused.err;
     EXPECT_THAT(refused.err, StartsWith("quo: "));
+    const bool no_verb = GetParam().arguments.empty() || GetParam().arguments[0] == "geocode";
+    EXPECT_THAT(refused.err,
+                HasSubstr(no_verb ? "; there are geolocate" : "(see quo " + GetParam().arguments[0] + " --help)"));
 }
 INSTANTIATE_TEST_SUITE_P(CommandLine, WrongUse, testing::ValuesIn(kWrongUses),
                          [](const auto& row) { return row.param.name; });
@@ -106,7 +109,8 @@ std::string without(std::string text, const std::string& part) { return text.era
 const FailedJob kFailedJobs[] = {
     {"EmptyHeader", " ", "", "no state vectors"},
     {"HeaderInWords", "not a header", "", "no state vectors"},
-    {"HeaderCutShort", kFiveVectors.substr(0, kFiveVectors.size() / 2), "", "no state vectors"},
+    {"HeaderCutShort", kFiveVectors.substr(0, kFiveVectors.size() / 2), "", "is no XML, line 1: "},
+    {"BrokenXml", "<QuorelXmlDoc>\n<a>\n</b>\n</QuorelXmlDoc>", "", "is no XML, line 3: "},
     {"NoCountOfVectors", without(kFiveVectors, "<nSV_n>5</nSV_n>"), "", "no state vectors"},
     {"FourVectors", header_of(test::CircularOrbit{41.3, 12.8, -12.7}, {.vectors = 4}), "", "at least 5"},
     {"NoSpacing", header_of(test::CircularOrbit{41.3, 12.8, -12.7}, {.spacing_s = 0.0}), "", "spacing"},
@@ -158,9 +162,70 @@ TEST(CommandLine, NamesFilesThatCannotBeOpened) {
     EXPECT_EQ(no_output.err, "quo: " + unreachable + ": No such file or directory\n");
 }
 
-// A file name is data: line feeds and terminal codes in it must not forge lines of their own.
-TEST(CommandLine, KeepsControlCharactersOutOfItsMessages) {
-    EXPECT_EQ(quo({"orbit", "a\nquo: b\033[2J"}).err, "quo: a quo: b [2J: No such file or directory\n");
+// File names and headers are data: what is in them must neither forge lines nor steer a terminal. Control
+// characters of one byte were blanked, those of U+0080 on and the ones that turn the writing came through.
+TEST(CommandLine, ShowsWhatATerminalWouldObey) {
+    struct Row {
+        const char *raw, *shown;
+    };
+    constexpr Row kRows[] = {
+        {"a\nquo: b\033[2J", "a\\nquo: b\\u001b[2J"},
+        {"\x7F", "\\u007f"},
+        {"\u0080\u009B2J\u009F", "\\u0080\\u009b2J\\u009f"},
+        {"\u061C\u200E\u200F", "\\u061c\\u200e\\u200f"},
+        {"\u202Agpj.\u202Etxt", "\\u202agpj.\\u202etxt"},
+        {"\u2066a\u2069", "\\u2066a\\u2069"},
+        {"\x9B"
+         "2J",
+         "\\x9b2J"},
+        {"\xC2", "\\xc2"},
+        {"\xE0\x82\x9B", "\\xe0\\x82\\x9b"},
+        {"Z\u00FCrich \u65E5\u672C \U0001F6F0", "Z\u00FCrich \u65E5\u672C \U0001F6F0"},
+    };
+    for (const auto& [raw, shown] : kRows)
+        EXPECT_EQ(quo({"orbit", raw}).err, std::string{"quo: "} + shown + ": No such file or directory\n");
+
+    const std::string evil = "\u009B2J\u202E\u2066\u200F";
+    const test::TemporaryFolder folder;
+    std::string text = test::read_text(kHeader);
+    for (const char* element : {"<SceneID>", "<SenseDate>", "<Swath>"})
+        text.insert(text.find(element) + std::string_view{element}.size(), evil);
+    const std::string header = folder.file("scene" + evil + ".xml"), table = folder.file("t" + evil + ".csv");
+    test::write_text(header, text);
+    test::write_text(table, "time" + evil + ",b\n1,2\n3,4\n");
+    const std::vector<std::vector<std::string>> jobs{
+        {"info", header},
+        {"info", header, "--json"},
+        {"validate", header},
+        {"validate", header, "--json"},
+        {"get", header, "DataSetInfo/SceneID"},
+        {"get", header, "DataSetInfo/SceneID", "--json"},
+        {"get", header, "A/" + evil},
+        {"footprint", header},
+        {"orbit", header},
+        {"orbit", header, "--json"},
+        {"config", "check", header},
+        {"config", "show", header},
+        {"quicklook", header, "x"},
+        {"fit", "--degree", "1", "--input", table},
+        {"fit", "--degree", "1", "--json", "--input", table},
+        {"fit", "--degree", "3", "--input", table},
+        {"time", evil},
+        {evil},
+        {"tiepoints", header, "--points", test::scene_file("s1a_iw1_slc_20220104_asc", "_tie_points.csv")}};
+    for (const auto& job : jobs) {
+        SCOPED_TRACE(testing::PrintToString(job));
+        const auto finished = quo(job);
+        const std::string said = finished.out + finished.err;
+        EXPECT_NE(said, "");
+        for (const char* code : {"\u009B", "\u202E", "\u2066", "\u200F"}) EXPECT_EQ(said.find(code), said.npos);
+    }
+}
+
+TEST(CommandLine, NamesTheVerbsWhereNoneIsMeant) {
+    const auto refused = quo({"nosuch"});
+    EXPECT_EQ(refused.exit_status, 2);
+    EXPECT_THAT(refused.err, StartsWith("quo: no verb nosuch; there are geolocate, orbit, time"));
 }
 
 }  // namespace

@@ -117,7 +117,7 @@ const std::string kEmpty =
 const Refused kRefused[] = {
     {"Missing", {"config", "show", "FILE"}, "", 1, "no such file"},
     {"Words", {"config", "check", "FILE"}, "words", 1, "is no configuration file"},
-    {"CutShort", {"config", "check", "FILE"}, kEmpty.substr(0, 90), 1, "is no configuration file"},
+    {"CutShort", {"config", "check", "FILE"}, kEmpty.substr(0, 90), 1, "is no XML, line "},
     {"NoRecord", {"config", "check", "FILE"}, kEmpty, 1, "holds no record"},
     {"NoRecordToShow", {"config", "show", "FILE"}, kEmpty, 1, "holds no record"},
     {"AddToWords", {"config", "new", "AzimuthConf", "-o", "FILE"}, "words", 1, "is no configuration file"},

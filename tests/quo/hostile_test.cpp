@@ -7,6 +7,7 @@
 #include <csignal>
 #include <cstdlib>
 #include <filesystem>
+#include <map>
 #include <string>
 #include <vector>
 
@@ -86,6 +87,62 @@ TEST_F(HostileFiles, NamesInHeadersAreNotFollowed) {
     EXPECT_EQ(test::quo({"validate", in + ".hdr"}).exit_status, 0);
 }
 
+// Each of these used to replace what it had just read, without a word: the raster by its own picture, the header
+// by a table.
+TEST_F(HostileFiles, OutputsAreNoneOfTheInputs) {
+    const std::string in = make("r", 40, 30, INT16, 0), header = file("g.hdr"), table = file("t.csv");
+    test::write_text(header, test::read_text(test::scene_file(test::scenes().front())));
+    test::write_text(table, "azimuth_time_s,range_time_s\n1167930360,0.0054\n");
+    std::filesystem::create_symlink(in, file("link"));
+    std::filesystem::create_hard_link(in, file("hard"));
+    std::filesystem::create_symlink(in + ".hdr", file("side"));
+    std::filesystem::create_hard_link(in + ".hdr", file("new.hdr"));  // the side file of a raster "new"
+    std::filesystem::create_symlink(in + ".hdr", in + ".vrt");
+    std::vector<std::vector<std::string>> jobs{
+        {"vrt", in},
+        {"spectrum", in, header, "--header", header},
+        {"geolocate", header, "--to", "ground", "--input", table, "--output", header},
+    };
+    for (const std::string& out : {file("./link"), file("hard"), file("side"), in + ".hdr"}) {
+        for (const char* verb : {"quicklook", "spectrum", "convert"}) jobs.push_back({verb, in, out});
+        jobs.push_back({"resample", in, out, "--lines", "50"});
+    }
+    for (const char* verb : {"quicklook", "spectrum"}) jobs.push_back({verb, in + ".hdr", in});
+    jobs.push_back({"convert", in, file("new")});
+    const auto bytes = [this] {
+        std::map<std::string, std::string> all;
+        for (const std::string& name : files()) all[name] = test::read_text(file(name));
+        return all;
+    };
+    const auto before = bytes();
+    for (const auto& job : jobs) {
+        SCOPED_TRACE(testing::PrintToString(job));
+        const test::Finished finished = test::quo(job);
+        EXPECT_EQ(finished.exit_status, 1);
+        EXPECT_THAT(finished.err, testing::MatchesRegex("quo: [^\n]*: would replace [^\n]*the job reads\n"));
+        EXPECT_EQ(bytes(), before);
+    }
+    for (const auto& job : std::vector<std::vector<std::string>>{
+             {"convert", in, in},
+             {"resample", in, in, "--lines", "50"},
+             {"geolocate", header, "--to", "ground", "--input", table, "--output", table}})
+        EXPECT_EQ(test::quo(job).exit_status, 0) << job[0];
+}
+
+// Whichever name of a product the user has.
+TEST_F(HostileFiles, HeadersAndRastersAnswerToBothNames) {
+    const std::string in = make("in.raw", 40, 30, INT16, 0), out = file("out.raw");
+    for (const std::string& name : {in, in + ".hdr"}) {
+        for (const std::vector<std::string>& job : {std::vector<std::string>{"info", name},
+                                                    {"validate", name},
+                                                    {"get", name, "RasterInfo/CellType"},
+                                                    {"convert", name, out},
+                                                    {"quicklook", name, file("out.png")},
+                                                    {"vrt", name}})
+            EXPECT_EQ(test::quo(job).exit_status, 0) << testing::PrintToString(job);
+    }
+}
+
 // Runs the tool while no file may grow beyond `blocks` units of the shell; its messages, then "exit N".
 std::string with_room(int blocks, const std::vector<std::string>& arguments) {
     std::vector<std::string> all{"-c",
@@ -118,7 +175,7 @@ TEST_F(HostileFiles, FullDisksLeaveOlderFilesWhole) {
     for (const auto& job : jobs) {
         SCOPED_TRACE(job.front());
         const std::string said = with_room(0, job);
-        EXPECT_THAT(said, testing::MatchesRegex("quo: [^\n]*\nexit 1\n"));
+        EXPECT_THAT(said, testing::MatchesRegex("quo: [^\n]*(File too large|disk full)[^\n]*\nexit 1\n"));
         EXPECT_EQ(files(), before);
     }
     for (const char* name : {"out.raw", "out.png", "out.csv", "in.raw.vrt"})
@@ -194,6 +251,20 @@ public:
 private:
     int master_;
 };
+
+// What stands in a table reaches a file as it is, but a terminal only as a text that it cannot obey.
+TEST_F(HostileFiles, TablesOnATerminalAreShown) {
+    const std::string table = file("t.csv"), scene = test::scene_file(test::scenes().front());
+    test::write_text(table, "name,azimuth_time_s,range_time_s\nx\u009B2J,1167930360,0.0054\n");
+    const std::vector<std::string> job{"geolocate", scene, "--to", "ground", "--input", table};
+    EXPECT_THAT(test::quo(job).out, HasSubstr("\nx\u009B2J,"));
+    const Terminal terminal;
+    std::vector<std::string> all{"-c", std::string{R"(exec "$0" "$@" > )"} + terminal.name(), QUO_TOOL};
+    all.insert(all.end(), job.begin(), job.end());
+    EXPECT_EQ(test::Child("/bin/sh", all).wait().exit_status, 0);
+    const std::string seen = terminal.read_until("2J,");
+    EXPECT_THAT(seen, HasSubstr("\nx\\u009b2J,"));
+}
 
 // 32 GB to be read, of which the user sees the beginning.
 TEST_F(HostileFiles, ConversionsShowTheirProgressAndCanBeInterrupted) {

@@ -32,6 +32,17 @@ protected:
     static void set(const std::string& header, const std::string& field, const std::string& value) {
         ASSERT_EQ(test::quo({"set", header, field, value}).exit_status, 0);
     }
+    // Puts a text into a field, whatever the tool thinks of it.
+    static void put(const std::string& header, const std::string& field, const std::string& value) {
+        const auto slash = field.find('/');
+        const std::string name = field.substr(slash + 1);
+        std::string text = test::read_text(header);
+        const std::size_t section = text.find('<' + field.substr(0, slash) + '>');
+        const std::size_t first = text.find('<' + name + '>', section) + name.size() + 2;
+        const std::size_t last = text.find('/' + name + '>', first) - 1;
+        ASSERT_LT(last, text.size()) << field;
+        test::write_text(header, text.replace(first, last - first, value));
+    }
     test::TemporaryFolder folder_;
 };
 
@@ -50,6 +61,20 @@ TEST_F(ProductVerbs, InfoKnowsEveryBundledScene) {
     }
 }
 
+// The corners used to be those of one line and one sample more than there are.
+TEST_F(ProductVerbs, InfoShowsTheCornersOfTheLastLine) {
+    const std::string scene = test::scene_file(test::scenes().front());
+    const auto facts = nlohmann::json::parse(test::quo({"info", scene, "--json"}).out);
+    const double azimuth_s = facts["last_line"]["seconds"];
+    constexpr double kNear_s = 0.005336535882737799, kDelta_s = 1.554116558005821e-08;  // of the scene
+    const double range_s = kNear_s + kDelta_s * (facts["region"]["samples"].get<int>() - 1);
+    const std::string table =
+        "azimuth_time_s,range_time_s\n" + test::text_of(azimuth_s) + "," + test::text_of(range_s) + "\n";
+    const test::Csv ground{test::quo({"geolocate", scene, "--to", "ground"}, table).out};
+    EXPECT_NEAR(facts["corners"][2]["latitude_deg"], ground.number(0, "latitude_deg"), 1e-9);
+    EXPECT_NEAR(facts["corners"][2]["longitude_deg"], ground.number(0, "longitude_deg"), 1e-9);
+}
+
 TEST_F(ProductVerbs, ValidateHasNoErrorInTheBundledScenes) {
     for (const std::string& name : test::scenes()) {
         const test::Finished finished = test::quo({"validate", test::scene_file(name)});
@@ -58,31 +83,67 @@ TEST_F(ProductVerbs, ValidateHasNoErrorInTheBundledScenes) {
     }
 }
 
-// One thing spoilt at a time.
+// One thing spoilt at a time. What is wrong by the field's own rules is also what `set` must not write: it used to
+// take any number, and nothing looked at texts, dates and counts at all.
 TEST_F(ProductVerbs, ValidateFindsWhatDoesNotFit) {
+    constexpr bool kRefused = true, kSet = false;
     struct Spoil {
         const char *field, *value;
-        int exit_status;
+        bool refused;  // by `set`
         const char* finding;
+        int exit_status = 1;
     };
     const Spoil rows[] = {
-        {"SamplingConstants/lambda_m", "0.06", 1, "error  SamplingConstants/lambda_m"},
-        {"SamplingConstants/prf_hz", "-5", 1, "error  SamplingConstants/prf_hz"},
-        {"SamplingConstants/frg_hz", "nan", 1, "error  SamplingConstants/frg_hz  \"nan\" is no finite number"},
-        {"DataSetInfo/RangeLooks", "5000", 1, "error  DataSetInfo/RangeLooks  5000 lies outside 1 to 1000"},
-        {"ROI/Lines", "17", 1, "error  ROI/SlowTimeLength"},
-        {"ROI/FastTimeDelta", "0", 1, "error  ROI/FastTimeLength"},
-        {"ROI/SlowStartTime", "5", 1, "error  StateVectorData/t0SV_s  the scene reaches"},
-        {"StateVectorData/t0SV_s", "17", 1, "the scene reaches"},
-        {"StateVectorData/dtSV_s", "0", 1, "error  StateVectorData/"},
-        {"StateVectorData/nSV_n", "4", 1, "4 state vectors, at least 5 are needed"},
+        {"SamplingConstants/lambda_m", "0.06", kSet, "error  SamplingConstants/lambda_m  times fc_hz is"},
+        {"SamplingConstants/prf_hz", "-5", kRefused, "error  SamplingConstants/prf_hz  -5 is not above 0"},
+        {"SamplingConstants/prf_hz", "inf", kRefused, "error  SamplingConstants/prf_hz  \"inf\" is not finite"},
+        {"SamplingConstants/frg_hz", "nan", kRefused, "error  SamplingConstants/frg_hz  \"nan\" is not finite"},
+        {"SamplingConstants/brf_hz", "fast", kRefused, "error  SamplingConstants/brf_hz  \"fast\" is no number"},
+        {"DataSetInfo/RangeLooks", "5000", kRefused, "error  DataSetInfo/RangeLooks  5000 lies above 1000"},
+        {"DataSetInfo/RangeLooks", "2.5", kRefused, "error  DataSetInfo/RangeLooks  \"2.5\" is no whole number"},
+        {"DataSetInfo/LookDirection", "7", kRefused, "error  DataSetInfo/LookDirection  7 lies above 1"},
+        {"DataSetInfo/Polarization", "XX", kRefused,
+         "error  DataSetInfo/Polarization  \"XX\" is none of H/H, V/V"},
+        {"DataSetInfo/SenseDate", "99-XXX-2022", kRefused,
+         "error  DataSetInfo/SenseDate  \"99-XXX-2022\" is no date"},
+        {"DataSetInfo/Projection", "SLANT", kRefused, "error  DataSetInfo/Projection  \"SLANT\" is none of"},
+        {"DataSetInfo/ImageType", "SLC", kRefused, "error  DataSetInfo/ImageType  \"SLC\" is none of"},
+        {"DataSetInfo/RefSystem", "MOON", kRefused, "error  DataSetInfo/RefSystem  \"MOON\" is none of"},
+        {"DataSetInfo/SensorName", "", kRefused, "error  DataSetInfo/SensorName  is empty"},
+        {"DataSetInfo/OrbitConfiguration", "DESCENDING", kSet, "DESCENDING, but the state vectors are ASCENDING"},
+        {"DataSetInfo/Projection", "GROUND RANGE", kSet, "warning  DataSetInfo/Projection  GROUND RANGE, but", 0},
+        {"ROI/Lines", "17", kSet, "error  ROI/SlowTimeLength"},
+        {"ROI/FastTimeDelta", "0", kSet, "error  ROI/FastTimeLength"},
+        {"ROI/SlowStartTime", "5", kSet, "error  StateVectorData/t0SV_s  the scene reaches"},
+        {"StateVectorData/t0SV_s", "17", kSet, "the scene reaches"},
+        {"StateVectorData/dtSV_s", "0", kSet, "error  StateVectorData/"},
+        {"StateVectorData/nSV_n", "4", kSet, "4 state vectors, at least 5 are needed"},
     };
     for (const Spoil& row : rows) {
-        SCOPED_TRACE(row.field);
-        const std::string header = copy_of_scene();
-        set(header, row.field, row.value);
+        SCOPED_TRACE(std::string{row.field} + " " + row.value);
+        const std::string header = copy_of_scene(), before = test::read_text(header);
+        EXPECT_EQ(test::quo({"set", header, row.field, row.value}).exit_status, row.refused ? 2 : 0);
+        EXPECT_EQ(test::read_text(header) == before, row.refused);
+        test::write_text(header, before);
+        put(header, row.field, row.value);
         expect_finding(header, row.exit_status, row.finding);
     }
+}
+
+// Of a field with one value three are no better than none, and reading takes whichever it finds first.
+TEST_F(ProductVerbs, CountsTheValuesOfAField) {
+    const std::string three = "error  SamplingConstants/prf_hz  has 3 values, not 1";
+    for (const char* values : {"<val N=\"1\">1</val><val N=\"2\">2</val><val N=\"3\">3</val>",
+                               "1</prf_hz><prf_hz>2</prf_hz><prf_hz>3"}) {
+        const std::string header = copy_of_scene();
+        put(header, "SamplingConstants/prf_hz", values);
+        expect_finding(header, 1, three);
+    }
+    const std::string header = copy_of_scene(), before = test::read_text(header);
+    EXPECT_EQ(test::quo({"set", header, "SamplingConstants/prf_hz", "1", "2", "3"}).exit_status, 2);
+    EXPECT_EQ(test::quo({"set", header, "DataSetInfo/RangeBandwidth", "1", "2"}).exit_status, 2);
+    EXPECT_EQ(test::read_text(header), before);
+    EXPECT_EQ(test::quo({"set", header, "SamplingConstants/Brg_hz", "-999"}).exit_status, 0) << "unknown again";
 }
 
 // What only the document tells: a field that is gone, a value too few, a section that stands twice.
@@ -95,7 +156,7 @@ TEST_F(ProductVerbs, ValidateLooksAtTheDocument) {
     const Edit rows[] = {
         {"<Lines>12236</Lines>", "", 1, "error  ROI/Lines  is missing"},
         {"<val N=\"1\">5636962.746301</val>", "", 1, "error  StateVectorData/pSV_m  has 47 values, not 48"},
-        {"<val N=\"1\">5636962.746301</val>", "<val N=\"1\">far</val>", 1, "\"far\" is no finite number"},
+        {"<val N=\"1\">5636962.746301</val>", "<val N=\"1\">far</val>", 1, "\"far\" is no number"},
         {"<ROI>", "<ROI/><ROI>", 0, "warning  ROI/-  stands 2 times"},
         {"<Channel Number=\"1\">", "<Channel Number=\"2\">", 1, "holds no object"},
     };

@@ -15,6 +15,7 @@
 #include "number.h"
 #include "output.h"
 #include "quo_base/generalSAR_configuration.h"
+#include "shown.h"
 
 namespace tool {
 namespace {
@@ -89,22 +90,12 @@ Json values_of(const parElement& element) {
 }
 
 std::string text_of(const Json& value) {
-    if (value.is_string()) return one_line(value.get<std::string>());
+    if (value.is_string()) return shown(value.get<std::string>());
     if (value.is_number_float()) return exact(value.get<double>());
     if (!value.is_array()) return value.dump();
     std::string text;
     for (const Json& part : value) text += (text.empty() ? "" : " ") + text_of(part);
     return text;
-}
-
-std::string print(const Json& json) {
-    return json.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n";
-}
-
-void put_out(const std::string& text) {
-    Output output{"-"};
-    output.write(text);
-    output.commit();
 }
 
 // --- doc --------------------------------------------------------------------------------------------------------
@@ -170,7 +161,7 @@ int document(const std::vector<std::string>& names) {
         text = described("Shared by all records", shared_parameters(shared));
         for (const char* name : Record::names()) text += "\n" + described(name, parameters_of(*record_of(name)));
     }
-    put_out(text);
+    print(text);
     return kFine;
 }
 
@@ -207,7 +198,8 @@ ConfigurationReview review_of(const std::string& file) {
     require_header_file(file);
     ConfigurationReview review;
     const int status = reviewConfiguration(file.c_str(), kChannel, review);
-    if (status == QUO_REFUSED) throw Failure(file + ": is no configuration file");
+    if (status == QUO_REFUSED)
+        throw Failure(file + ": " + Document::or_xml_defect(file, "is no configuration file"));
     if (status != QUO_OK) throw Failure(file + ": status " + status_text(status));
     return review;
 }
@@ -285,7 +277,7 @@ int show(const ConfigOptions& options) {
             status = kFindings;
         }
     }
-    put_out(options.json ? print(listing.json()) : listing.text());
+    options.json ? print_json(listing.json()) : print(listing.text());
     return status;
 }
 
@@ -301,12 +293,12 @@ int check(const ConfigOptions& options) {
         line += name;
         line += "  ";
         line += reason;
-        text += one_line(line);
+        text += shown(line);
         text += '\n';
     }
     text += std::to_string(review.findings.size()) + (review.findings.size() == 1 ? " error in " : " errors in ") +
             std::to_string(review.records.size()) + (review.records.size() == 1 ? " record\n" : " records\n");
-    put_out(options.json ? print(list) : text);
+    options.json ? print_json(list) : print(text);
     return review.findings.empty() ? kFine : kFindings;
 }
 

@@ -4,6 +4,7 @@
 #include <type_traits>
 #include <vector>
 
+#include "apart.h"
 #include "commands.h"
 #include "failure.h"
 #include "interrupt.h"
@@ -163,6 +164,7 @@ private:
 };
 
 int convert(const ConvertOptions& options) {
+    require_raster_apart(options.in, options.out);
     DataFile description;
     read_description(options.in, description);
     note_interrupts();

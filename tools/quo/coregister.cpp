@@ -7,12 +7,12 @@
 #include "commands.h"
 #include "failure.h"
 #include "number.h"
-#include "output.h"
 #include "quo_base/Coregist.h"
 #include "quo_base/MatrixAlgebraANSI.h"
 #include "region.h"
 #include "residuals.h"
 #include "scene.h"
+#include "shown.h"
 
 namespace tool {
 namespace {
@@ -156,8 +156,7 @@ std::string as_json(const Agreement& agreement, const Coregist& mapping) {
 
 void write_mapping(const std::string& file, Coregist& mapping) {
     quorelxml::setExactNumbers(true);
-    if (const int status = mapping.writeAuxiliaryFile(file.c_str(), 1, "REGIST"))
-        throw Failure(file + ": cannot be written, status " + status_text(status));
+    require_done(file, "cannot be written", [&] { return mapping.writeAuxiliaryFile(file.c_str(), 1, "REGIST"); });
 }
 
 int coregister(const CoregisterOptions& options) {
@@ -179,9 +178,7 @@ int coregister(const CoregisterOptions& options) {
         throw Failure("no sample form, status " + status_text(status));
     const Agreement agreement = judge(matches, mapping, master, slave);
     write_mapping(options.output, mapping);
-    Output output{"-"};
-    output.write(options.json ? as_json(agreement, mapping) : as_text(agreement));
-    output.commit();
+    print(options.json ? as_json(agreement, mapping) : as_text(agreement));
     return kFine;
 }
 

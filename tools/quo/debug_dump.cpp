@@ -13,8 +13,8 @@
 #include "commands.h"
 #include "failure.h"
 #include "number.h"
-#include "output.h"
 #include "quo_base/debugIO.h"
+#include "shown.h"
 
 namespace tool {
 namespace {
@@ -145,9 +145,7 @@ int show_dump(const DumpOptions& options) {
     if (options.values < 0) throw WrongUse("--values " + std::to_string(options.values));
     Dump dump{options.file};
     const std::vector<Json> values = dump.read(options.values);
-    Output output{"-"};
-    output.write(options.json ? json_of(dump, values) : text_of(dump, values));
-    output.commit();
+    print(options.json ? json_of(dump, values) : text_of(dump, values));
     const std::string defect = dump.defect();
     if (defect.empty()) return kFine;
     complain(options.file + ": " + defect);

@@ -10,12 +10,12 @@
 #include "earth.h"
 #include "failure.h"
 #include "number.h"
-#include "output.h"
 #include "quo_base/SARpolynomials.h"
 #include "quo_base/quorelxml_v2.h"
 #include "region.h"
 #include "residuals.h"
 #include "scene.h"
+#include "shown.h"
 
 namespace tool {
 namespace {
@@ -197,8 +197,7 @@ void store(const std::string& header, const Result& result, polySAR& set) {
     put(result.wanted[kIncidence], made.incidence, set.SL2THETA, set.nsl2theta);
     put(result.wanted[kLook], made.look, set.SL2PHI, set.nsl2phi);
     quorelxml::setExactNumbers(true);
-    if (const int status = set.writehdr(header.c_str()))
-        throw Failure(header + ": cannot be written, status " + status_text(status));
+    require_done(header, "cannot be written", [&] { return set.writehdr(header.c_str()); });
 }
 
 std::string as_text(const Result& result) {
@@ -256,9 +255,7 @@ int derive(const DeriveOptions& options) {
         throw Failure(options.header + ": the region cannot be derived from, status " + status_text(status));
     const bool anything = std::find(result.wanted.begin(), result.wanted.end(), true) != result.wanted.end();
     if (anything) store(options.header, result, set);
-    Output output{"-"};
-    output.write(options.json ? as_json(result) : as_text(result));
-    output.commit();
+    print(options.json ? as_json(result) : as_text(result));
     return kFine;
 }
 

@@ -27,7 +27,15 @@ Document::Document(const std::string& file) : file_{file} {
     const int status = parse();
     if (status == QUO_READ_FAILED) throw Failure(file + ": cannot be read");
     if (status == QUO_NO_MEMORY) throw Failure(file + ": does not fit into memory");
-    if (status != QUO_OK || !isRecognized()) throw Failure(file + ": is no header document");
+    if (status != QUO_OK || !isRecognized())
+        throw Failure(file + ": " + or_xml_defect(file, "is no header document"));
+}
+
+std::string Document::or_xml_defect(const std::string& file, const std::string& cause) {
+    char first = '\0';
+    std::ifstream{file} >> first;  // the first that is no blank
+    const std::string defect = first == '<' ? xmlDefect(file.c_str()) : "";
+    return defect.empty() ? cause : "is no XML, " + defect;
 }
 
 bool Document::in(const std::string& file) {
@@ -64,7 +72,7 @@ void Document::replace(const std::string& field, const std::vector<std::string>&
 }
 
 void Document::save() {
-    if (write() != QUO_OK) throw Failure(file_ + ": cannot be written");
+    require_done(file_, "cannot be written", [this] { return write(); });
 }
 
 }  // namespace tool

@@ -24,6 +24,10 @@ public:
     /** Whether a file is a header document. */
     static bool in(const std::string& file);
 
+    /** Why a file that should be a header is none: what is no XML in it, and on which line, where that is what it
+     * means to be, else `cause`. */
+    static std::string or_xml_defect(const std::string& file, const std::string& cause);
+
     [[nodiscard]] bool has_channel() const { return channelExists(kChannel); }
     [[nodiscard]] bool has(const std::string& path) const { return fieldExists(kChannel, path.c_str()); }
     /** How many elements bear that path. */

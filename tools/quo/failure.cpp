@@ -5,7 +5,8 @@
 #include <cstdio>
 #include <system_error>
 
-#include "quo_base/api.h"
+#include "quo_base/ckerr.h"
+#include "shown.h"
 
 namespace tool {
 
@@ -31,14 +32,13 @@ std::string status_text(int status) {
     return known == std::end(kMeanings) ? number : number + " (" + known->text + ")";
 }
 
-std::string one_line(std::string text) {
-    std::replace_if(
-        text.begin(), text.end(), [](unsigned char c) { return c < ' ' || c == 0x7F; }, ' ');
-    return text;
+std::string library_cause(int status) {
+    const int error = quo_take_system_error();
+    return error != 0 ? std::generic_category().message(error) : "status " + status_text(status);
 }
 
 void complain(const std::string& message) {
-    const std::string line = one_line("quo: " + message) + '\n';
+    const std::string line = shown("quo: " + message) + '\n';
     std::fwrite(line.data(), 1, line.size(), stderr);
 }
 

@@ -4,6 +4,8 @@
 #include <stdexcept>
 #include <string>
 
+#include "quo_base/ckerr.h"
+
 namespace tool {
 
 /** What the program's exit status says. */
@@ -29,8 +31,16 @@ std::string system_cause();
 /** What a status code of the library means, such as "12 (not seen from this orbit)". */
 std::string status_text(int status);
 
-/** A text that may quote a file, fit for one line: line feeds and other control characters become blanks. */
-std::string one_line(std::string text);
+/** The same of the last failure within the library, else what its status means. */
+std::string library_cause(int status);
+
+/** Makes a call of the library that returns a status; throws Failure "file: cannot ...: cause" unless that is 0.
+ */
+template <typename Call>
+void require_done(const std::string& file, const char* cannot, Call call) {
+    (void)quo_take_system_error();  // what is older has nothing to do with it
+    if (const int status = call()) throw Failure(file + ": " + cannot + ": " + library_cause(status));
+}
 
 /** Writes "quo: message" as one line to standard error. */
 void complain(const std::string& message);

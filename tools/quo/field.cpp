@@ -11,9 +11,11 @@
 #include "commands.h"
 #include "document.h"
 #include "failure.h"
+#include "field_check.h"
 #include "number.h"
 #include "output.h"
 #include "product.h"
+#include "shown.h"
 
 namespace tool {
 namespace {
@@ -66,11 +68,12 @@ private:
             if (json_)
                 list_.push_back(as_json(std::string{text}, numeric_));
             else
-                (lines_ += text) += '\n';
+                (lines_ += shown(text)) += '\n';
         });
         if (status == QUO_READ_FAILED) throw Failure(file_ + ": cannot be read");
         if (status == QUO_NO_MEMORY) throw Failure(file_ + ": does not fit into memory");
-        if (status != QUO_OK) throw Failure(file_ + ": is no header document");
+        if (status != QUO_OK)
+            throw Failure(file_ + ": " + Document::or_xml_defect(file_, "is no header document"));
         return count_ > 0;
     }
 
@@ -83,33 +86,37 @@ private:
 int get_field(const FieldOptions& options) {
     require_field(options.field);
     FieldReader reader{options};
-    Output output{"-"};
     if (options.json) {
-        const nlohmann::json about{{"field", options.field}, {"value", std::move(reader).value()}};
-        output.write(about.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n");
+        print_json({{"field", options.field}, {"value", std::move(reader).value()}});
     } else {
+        Output output{"-"};
         output.write(reader.lines());
+        output.commit();
     }
-    output.commit();
     return kFine;
 }
 
-// "nan" is a number that a header may hold; a word would read back as 0.
-bool can_be_number(const std::string& text) {
-    const bool not_finite = text == "nan" || text == "inf" || text == "-nan" || text == "-inf";
-    return not_finite || finite_number(text).has_value();
+// What would make the field say something that makes no sense. Fields that no object registers may hold anything
+// but, where polynomials and corner points are meant, words.
+std::string defect_of(const FieldOptions& options) {
+    GeneralSAR product;
+    if (const parElement* element = element_at(product, options.field))
+        return values_defect(*element, *element, options.values);
+    if (!is_numeric_field(product, options.field)) return "";
+    for (const std::string& value : options.values)
+        if (!finite_number(value)) return "\"" + value + "\" is no finite number";
+    return "";
 }
 
 int set_field(const FieldOptions& options) {
     require_field(options.field);
-    const bool numeric = is_number(options.field);
     for (const std::string& value : options.values) {
         if (value.size() >= Document::kTextRoom) {
             throw WrongUse("a value of " + std::to_string(value.size()) + " bytes");
         }
-        if (numeric && !can_be_number(value))
-            throw WrongUse(options.field + " is a number, " + value + " is none");
     }
+    const std::string defect = defect_of(options);
+    if (!defect.empty()) throw WrongUse(options.field + ": " + defect);
     Document document{options.header};
     if (!document.has(options.field) && !options.create) {
         throw Failure(options.header + ": has no field " + options.field + " (--create makes it)");

@@ -8,10 +8,10 @@
 #include "commands.h"
 #include "failure.h"
 #include "number.h"
-#include "output.h"
 #include "quo_base/MatrixAlgebraANSI.h"
 #include "quo_base/api.h"
 #include "residuals.h"
+#include "shown.h"
 #include "table.h"
 
 namespace tool {
@@ -133,9 +133,7 @@ int fit_table(const FitOptions& options) {
         throw Failure(std::to_string(points.x.size()) + " points do not determine degree " +
                       std::to_string(options.degree));
     const Fit fit = fit_points(points, options.degree);
-    Output output{"-"};
-    output.write(options.json ? as_json(points, fit) : as_text(points, fit));
-    output.commit();
+    print(options.json ? as_json(points, fit) : as_text(points, fit));
     if (fit.summary.rank > options.degree) return kFine;
     complain("the points determine only " + std::to_string(fit.summary.rank) + " of " +
              std::to_string(options.degree + 1) + " coefficients; the others are 0");

@@ -6,8 +6,8 @@
 
 #include "commands.h"
 #include "failure.h"
-#include "output.h"
 #include "product.h"
+#include "shown.h"
 
 namespace tool {
 namespace {
@@ -83,9 +83,7 @@ int footprint(const std::string& header) {
         {"type", "Feature"},
         {"properties", {{"header", header}, {"scene", product.dataSetInfo.SceneID}}},
         {"geometry", geometry_of(ring)}};
-    Output output{"-"};
-    output.write(feature.dump(-1, ' ', false, nlohmann::json::error_handler_t::replace) + "\n");
-    output.commit();
+    print_json(feature, -1);
     return kFine;
 }
 

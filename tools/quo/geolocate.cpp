@@ -5,6 +5,7 @@
 #include <optional>
 #include <span>
 
+#include "apart.h"
 #include "commands.h"
 #include "earth.h"
 #include "failure.h"
@@ -229,6 +230,7 @@ void warn_of_coarse_orbit(const Scene& scene, const GeneralSAROrbit& orbit) {
 
 int geolocate(const GeolocateOptions& options) {
     const Direction& direction = direction_of(options);
+    require_apart(header_files(options.header), {options.output});  // the table may be replaced by itself
     note_interrupts();
     Scene scene{options.header};
     if (options.wavelength_m) scene.use_wavelength(*options.wavelength_m);

@@ -7,9 +7,9 @@
 #include "date.h"
 #include "failure.h"
 #include "number.h"
-#include "output.h"
 #include "product.h"
 #include "raster.h"
+#include "shown.h"
 
 namespace tool {
 namespace {
@@ -19,7 +19,7 @@ namespace {
 class Facts {
 public:
     void add(const char* name, const char* key, const std::string& text, nlohmann::ordered_json value) {
-        rows_.push_back({name, one_line(text)});
+        rows_.push_back({name, shown(text)});
         json_[key] = std::move(value);
     }
     void add_text(const char* name, const char* key, const std::string& text) { add(name, key, text, text); }
@@ -45,9 +45,7 @@ public:
         }
         return text;
     }
-    [[nodiscard]] std::string json() const {
-        return json_.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n";
-    }
+    [[nodiscard]] const nlohmann::ordered_json& json() const { return json_; }
 
 private:
     static constexpr double kUnknown = -900.0;
@@ -74,7 +72,7 @@ void add_data_set(Facts& facts, const DataSetInfo_Obj& info) {
 void add_region(Facts& facts, const ROI_Obj& region) {
     if (region.isNULL() != 0) return;
     facts.add_time("first line", "first_line", region.SlowStartTime);
-    facts.add_time("last line", "last_line", region.SlowStartTime + region.SlowTimeDelta * (region.Lines - 1));
+    facts.add_time("last line", "last_line", last_line_time(region));
     facts.add_number("span", "span_s", region.SlowTimeLength, 1.0, "s");
     facts.add("region", "region",
               std::to_string(region.Lines) + " lines x " + std::to_string(region.Samples) + " samples",
@@ -152,9 +150,7 @@ int show_info(const std::string& header, bool json) {
     if (product.GSexists(gsSamplingConstants)) add_sampling(facts, product.samplingConstants);
     add_corners(facts, product);
     add_objects(facts, product);
-    Output output{"-"};
-    output.write(json ? facts.json() : facts.text());
-    output.commit();
+    json ? print_json(facts.json()) : print(facts.text());
     return kFine;
 }
 

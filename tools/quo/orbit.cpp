@@ -9,6 +9,7 @@
 #include "number.h"
 #include "output.h"
 #include "scene.h"
+#include "shown.h"
 
 namespace tool {
 namespace {
@@ -107,7 +108,7 @@ std::string as_text(Scene& scene, const std::vector<std::string>& findings) {
     const GeneralSAROrbit& orbit = scene.orbit();
     const auto time = [](double time_s) { return exact(time_s) + " s  " + date_text(time_s).value_or("-"); };
     std::vector<std::pair<std::string, std::string>> facts{
-        {"header", scene.name()},
+        {"header", shown(scene.name())},
         {"state vectors", std::to_string(orbit.nSV_n) + ", " + exact(orbit.dtSV_s) + " s apart"},
         {"first", time(scene.first_time())},
         {"last", time(scene.last_time())},
@@ -151,17 +152,17 @@ int show_orbit(const OrbitOptions& options) {
     const auto vectors = state_vectors(scene, times_asked_for(options, scene, outside));
     const auto findings = scene.findings();
 
-    Output output{"-"};
     if (options.json) {
-        output.write(as_json(scene, findings, vectors).dump(2) + "\n");
+        print_json(as_json(scene, findings, vectors));
     } else if (vectors.empty()) {
-        output.write(as_text(scene, findings));
+        print(as_text(scene, findings));
     } else {
-        output.write(as_comments(as_text(scene, findings)));
+        Output output{"-"};
+        output.write(shown_lines(as_comments(as_text(scene, findings))));
         output.write("azimuth_time_s,date,direction,x_m,y_m,z_m,vx_m_s,vy_m_s,vz_m_s\n");
         for (const StateVector& vector : vectors) output.write(as_row(vector));
+        output.commit();
     }
-    output.commit();
     return outside == 0 && findings.empty() ? kFine : kFindings;
 }
 

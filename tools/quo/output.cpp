@@ -9,6 +9,7 @@
 #include "failure.h"
 #include "interrupt.h"
 #include "sarutillib/file_io.h"
+#include "shown.h"
 
 namespace tool {
 namespace {
@@ -21,6 +22,7 @@ Output::Output(const std::string& name) : name_{name == "-" ? "standard output" 
     struct stat about {};
     if (name == "-") {
         descriptor_ = STDOUT_FILENO;
+        terminal_ = isatty(descriptor_) == 1;
     } else if (stat(name.c_str(), &about) == 0 && !S_ISREG(about.st_mode)) {
         descriptor_ = open(name.c_str(), O_WRONLY | O_CLOEXEC);
         if (descriptor_ < 0) fail();
@@ -38,7 +40,10 @@ void Output::fail() const { throw Failure(name_ + ": " + system_cause()); }
 
 void Output::write(std::string_view text) {
     throw_if_interrupted();
-    pending_ += text;
+    if (terminal_)
+        pending_ += shown_lines(text);  // tables pass on what stood in their input
+    else
+        pending_ += text;
     if (pending_.size() >= kBlock) flush();
 }
 

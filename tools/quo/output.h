@@ -15,7 +15,8 @@ namespace tool {
  *
  * A file is written beside its final name and renamed by commit(); whatever happens before, an older file of that
  * name stays whole and the unfinished one is taken away. A name that is no regular file (a pipe, a device) is
- * written to directly. Throws Failure where writing fails, and Interrupted. */
+ * written to directly. What a terminal on standard output would obey is shown (shown.h). Throws Failure where
+ * writing fails, and Interrupted. */
 class Output {
 public:
     explicit Output(const std::string& name);
@@ -36,6 +37,7 @@ private:
     std::string name_;
     std::unique_ptr<quo::AtomicFile> file_;  // none where the output is written to directly
     int descriptor_ = -1;
+    bool terminal_ = false;
     std::string pending_;
 };
 

@@ -37,7 +37,7 @@ void read_product(const std::string& header, GeneralSAR& product) {
         if (product.GSexists(static_cast<GSObject>(object))) return;
     }
     if (described_raster(product) != nullptr) return;
-    throw Failure(header + ": holds no object of a product");
+    throw Failure(header + ": " + Document::or_xml_defect(header, "holds no object of a product"));
 }
 
 const char* section_of(GSObject object) { return kSections[static_cast<std::size_t>(object)]; }
@@ -80,20 +80,27 @@ std::vector<Corner> grid_corners(const GeneralSAR& product) {
     return corners;
 }
 
+double last_line_time(const ROI_Obj& region) {
+    return region.SlowStartTime + region.SlowTimeDelta * (region.Lines - 1);
+}
+
 std::vector<Corner> orbit_corners(GeneralSAR& product) {
     const ROI_Obj& region = product.roi.Roi;
     for (const GSObject needed : {gsOrbit, gsRoi, gsDataSetInfo}) {  // the last tells the look side
         if (!product.GSexists(needed)) return {};
     }
     if (region.isNULL() != 0) return {};
+    // Of the last line and sample themselves: the region's lengths lead to the ones after them.
+    const double first_s = region.SlowStartTime, near_s = region.FastStartTime;
+    const double last_s = last_line_time(region);
+    const double far_s = near_s + region.FastTimeDelta * (region.Samples - 1);
+    const std::pair<double, double> places[] = {
+        {first_s, near_s}, {last_s, near_s}, {last_s, far_s}, {first_s, far_s}};
     std::vector<Corner> corners;
-    for (const ROI_Time& at :
-         {region.GetUpLeft(), region.GetUpRight(), region.GetDownRight(), region.GetDownLeft()}) {
+    for (const auto& [azimuth_s, range_s] : places) {
         Corner corner{};
-        if (product.orbit.SVGetLatLon(at.SlowTime, at.FastTime, &corner.latitude_deg, &corner.longitude_deg) !=
-            0) {
+        if (product.orbit.SVGetLatLon(azimuth_s, range_s, &corner.latitude_deg, &corner.longitude_deg) != 0)
             return {};
-        }
         corners.push_back(corner);
     }
     return corners;

@@ -23,13 +23,16 @@ const parElement* element_at(GeneralSAR& product, std::string_view field);
 /** Whether a field is known to hold numbers. */
 bool is_numeric_field(GeneralSAR& product, std::string_view field);
 
+/** Azimuth time of a region's last line, s since 1985. */
+double last_line_time(const ROI_Obj& region);
+
 struct Corner {
     double latitude_deg, longitude_deg;
 };
 /** The corners of a product around its edge, from the corner grid, else as orbit_corners() finds them. Empty where
  * neither can be had. */
 std::vector<Corner> corners_of(GeneralSAR& product);
-/** The same from orbit, region and look side alone. */
+/** The same from orbit, region and look side alone: of the first and the last line and sample. */
 std::vector<Corner> orbit_corners(GeneralSAR& product);
 /** The same from the corner grid alone. */
 std::vector<Corner> grid_corners(const GeneralSAR& product);

@@ -5,6 +5,7 @@
 #include <memory>
 #include <vector>
 
+#include "apart.h"
 #include "commands.h"
 #include "failure.h"
 #include "interrupt.h"
@@ -156,6 +157,7 @@ Stretch stretch_of(const QuicklookOptions& options, const std::vector<float>& po
 }
 
 int quicklook(const QuicklookOptions& options) {
+    require_apart(raster_files(options.raster), {options.picture});
     if (options.width < 1) throw WrongUse("--width " + std::to_string(options.width));
     DataFile raster;
     read_description(options.raster, raster);

@@ -6,6 +6,7 @@
 #include <optional>
 #include <vector>
 
+#include "apart.h"
 #include "commands.h"
 #include "failure.h"
 #include "interrupt.h"
@@ -224,6 +225,7 @@ std::string defect_of_centre(const std::string& text) {
 }
 
 int resample(const ResampleOptions& options) {
+    require_raster_apart(options.in, options.out);
     DataFile description;
     read_description(options.in, description);
     if (description.NrOfLinesPerImage < 1 || description.NrOfPixelsPerLine < 1)

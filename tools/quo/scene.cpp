@@ -8,6 +8,7 @@
 #include <cerrno>
 #include <cmath>
 
+#include "document.h"
 #include "failure.h"
 #include "number.h"
 #include "quo_base/acquisition.h"
@@ -39,7 +40,8 @@ std::vector<std::string> check(const GeneralSAROrbit& orbit) {
  * all. */
 std::string why_no_orbit(const char* header, int status) {
     SAROrbitStateVectors_Obj vectors;
-    if (vectors.readhdr(header) != 0 || vectors.nSV_n < 1) return "no state vectors that can be read";
+    if (vectors.readhdr(header) != 0 || vectors.nSV_n < 1)
+        return Document::or_xml_defect(header, "no state vectors that can be read");
     GeneralSAROrbit orbit;
     const auto values = static_cast<std::ptrdiff_t>(vectors.nSV_n) * 3;
     if (orbit.SVCreate(vectors.t0SV_s, vectors.dtSV_s, vectors.nSV_n) != 0)

@@ -7,15 +7,16 @@
 #include <numbers>
 #include <vector>
 
+#include "apart.h"
 #include "commands.h"
 #include "failure.h"
 #include "interrupt.h"
 #include "number.h"
-#include "output.h"
 #include "plot.h"
 #include "progress.h"
 #include "quo_base/acquisition.h"
 #include "raster.h"
+#include "shown.h"
 #include "transform.h"
 
 namespace tool {
@@ -173,6 +174,9 @@ Curve curve_of(const char* direction, const Power& power, double centre, double 
 }
 
 int spectrum(const SpectrumOptions& options) {
+    std::vector<std::string> read = raster_files(options.raster);
+    if (!options.header.empty()) read.push_back(options.header);
+    require_apart(read, {options.picture});
     const Rates rates = rates_of(options.header);
     DataFile raster;
     read_description(options.raster, raster);
@@ -202,10 +206,7 @@ int spectrum(const SpectrumOptions& options) {
         json[name] = value;
         text += std::string{name} + "," + exact(value) + "," + rates.unit + "\n";
     }
-    if (options.json) text = json.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n";
-    Output output{"-"};
-    output.write(text);
-    output.commit();
+    options.json ? print_json(json) : print(text);
     return kFine;
 }
 

@@ -8,10 +8,10 @@
 #include "earth.h"
 #include "failure.h"
 #include "number.h"
-#include "output.h"
 #include "quo_base/gr_pt.h"
 #include "residuals.h"
 #include "scene.h"
+#include "shown.h"
 #include "table.h"
 
 namespace tool {
@@ -140,7 +140,7 @@ Agreement check_scene(const std::string& header, const TiepointsOptions& options
                                              table.need("latitude_deg"),   table.need("longitude_deg"),
                                              table.need("height_m"),       table.need("incidence_deg")};
     Agreement agreement{
-        .scene = scene_name(header), .vertical = vertical_of(table, options.incidence), .residuals = {}};
+        .scene = shown(scene_name(header)), .vertical = vertical_of(table, options.incidence), .residuals = {}};
     while (table.next()) {
         ++agreement.points;
         const int status = compare(scene.orbit(), tie_point(table, columns), agreement);
@@ -197,7 +197,7 @@ std::string as_json(const std::vector<Agreement>& list) {
         }
         json.push_back(entry);
     }
-    return json.dump(2) + "\n";
+    return json.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n";
 }
 
 int check_tiepoints(const TiepointsOptions& options) {
@@ -205,9 +205,7 @@ int check_tiepoints(const TiepointsOptions& options) {
         throw WrongUse("--points belongs to a single header");
     std::vector<Agreement> list;
     for (const std::string& header : options.headers) list.push_back(check_scene(header, options));
-    Output output{"-"};
-    output.write(options.json ? as_json(list) : as_text(list));
-    output.commit();
+    print(options.json ? as_json(list) : as_text(list));
     const bool all_solved =
         std::all_of(list.begin(), list.end(), [](const Agreement& a) { return a.unsolved == 0; });
     return all_solved ? kFine : kFindings;

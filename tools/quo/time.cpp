@@ -5,7 +5,7 @@
 #include "date.h"
 #include "failure.h"
 #include "number.h"
-#include "output.h"
+#include "shown.h"
 
 namespace tool {
 namespace {
@@ -29,9 +29,7 @@ int convert_times(const TimeOptions& options) {
         list.push_back({{"seconds", seconds}, {"date", date ? nlohmann::json(*date) : nlohmann::json()}});
         text += exact(seconds) + "  " + date.value_or("-") + "\n";
     }
-    Output output{"-"};
-    output.write(options.json ? list.dump(2) + "\n" : text);
-    output.commit();
+    options.json ? print_json(list) : print(text);
     return result;
 }
 

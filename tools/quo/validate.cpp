@@ -11,11 +11,12 @@
 #include "document.h"
 #include "earth.h"
 #include "failure.h"
+#include "field_check.h"
 #include "number.h"
-#include "output.h"
 #include "product.h"
 #include "raster.h"
 #include "scene.h"
+#include "shown.h"
 
 namespace tool {
 namespace {
@@ -39,6 +40,7 @@ public:
         if (Document::in(header_)) check_structure();
         check_presence();
         check_values();
+        check_description();
         check_raster();
         check_sampling();
         check_region();
@@ -86,12 +88,13 @@ private:
         if (times < 1) return;
         if (times > 1) warn(section, "-", "stands " + std::to_string(times) + " times");
         const GeneralSAR_Base& elements = elements_of(product_, object);
+        const GeneralSAR_Base& defaults = elements_of(fresh_, object);
         bool complete = true;
         for (int k = 0; k < elements.elementCount(); ++k) {
             const parElement& element = *elements.element(k);
             const std::string path = std::string{section} + "/" + element.name;
             if (document.has(path)) {
-                check_texts(document, section, element, path);
+                check_texts(document, section, element, *defaults.element(k), path);
             } else if (element.mandatory) {
                 error(section, element.name, "is missing");
                 complete = false;
@@ -108,64 +111,66 @@ private:
             return reason.starts_with(header_ + ": ") ? reason.substr(header_.size() + 2) : reason;
         }
     }
-    void check_texts(Document& document, const char* section, const parElement& element, const std::string& path) {
-        if (element.type == parElement::typeString) return;
-        const bool listed = element.count > 1 && !document.is_array(path);  // "1.5, 2.5", the older form of arrays
+    // The texts as they stand, of which reading takes what it can.
+    void check_texts(Document& document, const char* section, const parElement& element, const parElement& fresh,
+                     const std::string& path) {
+        const bool array = document.is_array(path);
+        const bool listed = element.count > 1 && !array;  // "1.5, 2.5", the older form of arrays
         if (listed) return;
-        const std::vector<std::string> values = document.values(path);
-        for (const std::string& value : values) {
-            if (!finite_number(value))
-                return error(section, element.name, "\"" + value + "\" is no finite number");
-        }
-        if (element.count > 1 && values.size() != static_cast<std::size_t>(element.count)) {
-            error(section, element.name,
-                  "has " + std::to_string(values.size()) + " values, not " + std::to_string(element.count));
-        }
+        if (!array && element.scalar && document.count(path) > 1)
+            return error(section, element.name, element.countDefect(count_of(document, path)));
+        const std::string defect = values_defect(element, fresh, document.values(path));
+        if (!defect.empty()) error(section, element.name, defect);
+    }
+    static std::size_t count_of(const Document& document, const std::string& path) {
+        return static_cast<std::size_t>(document.count(path));
     }
 
-    // Every number must be one, and within the bounds that its field was registered with. Values that still are
-    // what a new object has mark what is unknown.
+    // Every value must make sense by the rules of its field.
     void check_values() {
-        GeneralSAR fresh;
         for (int i = gsRoi; i < GeneralSAR::kObjects; ++i) {
             const auto object = static_cast<GSObject>(i);
             if (object == gsOrbit || !has(object)) continue;  // the state vectors are looked at once
             const GeneralSAR_Base& values = elements_of(product_, object);
-            const GeneralSAR_Base& defaults = elements_of(fresh, object);
-            for (int k = 0; k < values.elementCount(); ++k) {
+            const GeneralSAR_Base& defaults = elements_of(fresh_, object);
+            for (int k = 0; k < values.elementCount(); ++k)
                 check_element(section_of(object), *values.element(k), *defaults.element(k));
-            }
         }
     }
     void check_element(const char* section, const parElement& element, const parElement& fresh) {
         for (int i = 0; i < element.count; ++i) {
-            const auto value = number(element, i);
-            if (!value) return;
-            if (!std::isfinite(*value)) return error(section, element.name, "is not finite");
-            const bool unknown = i < fresh.count && number(fresh, i) == value;
-            const bool bounded = element.minimum != 0.0 || element.maximum != 0.0;
-            // Left-looking products carry -1, which the registered bounds do not tell.
-            const bool left = *value == -1.0 && std::string_view{element.name} == "LookDirection";
-            if (bounded && !unknown && !left && (*value < element.minimum || *value > element.maximum)) {
-                return error(
-                    section, element.name,
-                    exact(*value) + " lies outside " + exact(element.minimum) + " to " + exact(element.maximum));
-            }
+            const std::string defect = value_defect(element, fresh, i, value_text(element, i));
+            if (!defect.empty()) return error(section, element.name, defect);
         }
     }
-    static std::optional<double> number(const parElement& element, int i) {
-        switch (element.type) {
-            case parElement::typeDouble:
-                return static_cast<const double*>(element.pointer)[i];
-            case parElement::typeFloat:
-                return static_cast<const float*>(element.pointer)[i];
-            case parElement::typeInt:
-                return static_cast<const std::int32_t*>(element.pointer)[i];
-            case parElement::typeString:
-            case parElement::typeNone:
-                break;
-        }
-        return std::nullopt;
+
+    // What the description says of the rest of the product.
+    void check_description() {
+        if (!has(gsDataSetInfo)) return;
+        const DataSetInfo_Obj& info = product_.dataSetInfo;
+        const std::string_view said = info.OrbitConfiguration;
+        const char* flown = has(gsOrbit) ? direction() : nullptr;
+        if (flown && (said == "ASCENDING" || said == "DESCENDING") && said != flown)
+            error("DataSetInfo", "OrbitConfiguration", std::string{said} + ", but the state vectors are " + flown);
+        const SamplingConstants_Obj& sampling = product_.samplingConstants;
+        const double slant_s = sampling.Trg_s * info.RangeLooks;
+        const bool both = has(gsRoi) && has(gsSamplingConstants) && sampling.Trg_s > 0.0;
+        if (both && info.IsProjection(DataSetInfo_Obj::dsGroundRange) &&
+            std::abs(product_.roi.Roi.FastTimeDelta - slant_s) <= kSame * slant_s)
+            warn("DataSetInfo", "Projection",
+                 "GROUND RANGE, but ROI/FastTimeDelta is the interval in slant range");
+    }
+    // In the middle of the scene, or where that is not known, at the first vector.
+    [[nodiscard]] const char* direction() const {
+        const GeneralSAROrbit& orbit = product_.orbit;
+        const ROI_Obj& region = product_.roi.Roi;
+        double vector = 0.0;
+        if (has(gsRoi) && region.isNULL() == 0 && orbit.dtSV_s > 0.0)
+            vector = (region.GetCenter().SlowTime - orbit.t0SV_s) / orbit.dtSV_s;
+        if (!(vector >= 0.0 && vector <= orbit.nSV_n - 1)) vector = 0.0;
+        const double up = orbit.vSV_mOs[3 * std::lround(vector) + 2];
+        if (up == 0.0) return nullptr;
+        return up > 0.0 ? "ASCENDING" : "DESCENDING";
     }
 
     // The raster is looked for beside its header only, under the header's own name.
@@ -202,7 +207,7 @@ private:
     }
     // Two values that describe the same thing.
     void check_same(const char* object, const char* field, double value, const char* other, double expected) {
-        if (value > kUnknown && expected > kUnknown && std::abs(value - expected) > 1e-3 * std::abs(expected)) {
+        if (value > kUnknown && expected > kUnknown && std::abs(value - expected) > kSame * std::abs(expected)) {
             warn(object, field, exact(value) + ", but " + other + " is " + exact(expected));
         }
     }
@@ -227,11 +232,6 @@ private:
         if (s.Brg_hz > s.frg_hz && s.frg_hz > 0.0)
             error("SamplingConstants", "Brg_hz", "is larger than the sampling rate");
         if (s.Baz_hz > s.prf_hz && s.prf_hz > 0.0) warn("SamplingConstants", "Baz_hz", "is larger than the PRF");
-        for (const auto& [name, value] :
-             {std::pair{"lambda_m", s.lambda_m}, {"prf_hz", s.prf_hz}, {"frg_hz", s.frg_hz}}) {
-            if (value > kUnknown && !(value > 0.0))
-                error("SamplingConstants", name, exact(value) + " is not above 0");
-        }
     }
 
     void check_axis(const char* length_name, double length, double step, int count, const char* count_name,
@@ -348,7 +348,10 @@ private:
         check_order("SlantToPhi", set.SL2PHI, set.nsl2phi);
     }
 
+    static constexpr double kSame = 1e-3;  // of a value: two that differ by less say the same
+
     GeneralSAR& product_;
+    GeneralSAR fresh_;  // what a new product holds
     std::string header_;
     std::vector<Finding> findings_;
 };
@@ -365,16 +368,14 @@ int validate(const std::string& header, bool json) {
         errors += finding.error ? 1 : 0;
         list.push_back(
             {{"kind", kind}, {"object", finding.object}, {"field", finding.field}, {"reason", finding.reason}});
-        text += one_line(std::string{kind} + "  " + finding.object + "/" + finding.field + "  " + finding.reason) +
-                "\n";
+        text +=
+            shown(std::string{kind} + "  " + finding.object + "/" + finding.field + "  " + finding.reason) + "\n";
     }
     const auto count = [](int number, const char* what) {
         return std::to_string(number) + " " + what + (number == 1 ? "" : "s");
     };
     text += count(errors, "error") + ", " + count(static_cast<int>(findings.size()) - errors, "warning") + "\n";
-    Output output{"-"};
-    output.write(json ? list.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n" : text);
-    output.commit();
+    json ? print_json(list) : print(text);
     return errors == 0 ? kFine : kFindings;
 }
 

@@ -3,6 +3,7 @@
 #include <memory>
 #include <string_view>
 
+#include "apart.h"
 #include "commands.h"
 #include "failure.h"
 #include "output.h"
@@ -65,6 +66,7 @@ int write_vrt(const std::string& name) {
     DataFile raster;
     read_description(name, raster);
     if (raster.CellType == INT8_COMPLEX) throw Failure(name + ": GDAL has no type for INT8_COMPLEX");
+    require_apart(raster_files(name), {name + ".vrt"});
     Output output{name + ".vrt"};
     output.write(vrt_text(raster, std::filesystem::path{name}.filename().string()));
     output.commit();

@@ -26,16 +26,16 @@ namespace sampling {
 using Obj = SamplingConstants_Obj;
 constexpr quo::FieldTable kTable{
     "SamplingConstants",
-    QUO_FIELD(fc_hz, "CarrierFrequency"),
-    QUO_FIELD(frg_hz, "SamplingRate"),
-    QUO_FIELD(Brg_hz, "RangeBandWidth"),
-    QUO_FIELD(Trg_s, "RangeTSamplingStep"),
-    QUO_FIELD(prf_hz, "PRF"),
-    QUO_FIELD(pri_s, "PRI"),
-    QUO_FIELD(Baz_hz, "AzimuthBandwidth"),
-    QUO_FIELD(brf_hz, "BRF"),
-    QUO_FIELD(bri_s, "BRI"),
-    QUO_FIELD(lambda_m, "WaveLength"),
+    QUO_FIELD(fc_hz, "CarrierFrequency", quo::above(0.0)),
+    QUO_FIELD(frg_hz, "SamplingRate", quo::above(0.0)),
+    QUO_FIELD(Brg_hz, "RangeBandWidth", quo::above(0.0)),
+    QUO_FIELD(Trg_s, "RangeTSamplingStep", quo::above(0.0)),
+    QUO_FIELD(prf_hz, "PRF", quo::above(0.0)),
+    QUO_FIELD(pri_s, "PRI", quo::above(0.0)),
+    QUO_FIELD(Baz_hz, "AzimuthBandwidth", quo::above(0.0)),
+    QUO_FIELD(brf_hz, "BRF", quo::at_least(0.0)),
+    QUO_FIELD(bri_s, "BRI", quo::at_least(0.0)),
+    QUO_FIELD(lambda_m, "WaveLength", quo::above(0.0)),
 };
 }  // namespace sampling
 
@@ -43,19 +43,25 @@ namespace pulse {
 using Obj = SARPulse_Obj;
 constexpr quo::FieldTable kTable{
     "Pulse",
-    QUO_FIELD(PulseLength),
-    QUO_FIELD(Bandwidth),
+    QUO_FIELD(PulseLength, quo::above(0.0)),
+    QUO_FIELD(Bandwidth, quo::above(0.0)),
     QUO_FIELD(PulseKRate),
-    QUO_FIELD(PulseEnergy),
-    QUO_FIELD(PulseSamplingRate),
+    QUO_FIELD(PulseEnergy, quo::at_least(0.0)),
+    QUO_FIELD(PulseSamplingRate, quo::above(0.0)),
 };
 }  // namespace pulse
 
 namespace attitude {
 using Obj = SensorAttitude_Obj;
 constexpr quo::FieldTable kTable{
-    "SensorAttitude",       QUO_FIELD(Eq_speed),      QUO_FIELD(Eq_distance), QUO_FIELD(Mean_DC),
-    QUO_FIELD(SquintAngle), QUO_FIELD(AntennaLength), QUO_FIELD(DroopGain),   QUO_FIELD(Temperature),
+    "SensorAttitude",
+    QUO_FIELD(Eq_speed, quo::at_least(0.0)),
+    QUO_FIELD(Eq_distance, quo::at_least(0.0)),
+    QUO_FIELD(Mean_DC),
+    QUO_FIELD(SquintAngle, quo::between(-90.0, 90.0)),
+    QUO_FIELD(AntennaLength, quo::above(0.0)),
+    QUO_FIELD(DroopGain),
+    QUO_FIELD(Temperature),
 };
 
 // The data set of an annex file ends with one record per swath: a temperature and the gains.
@@ -69,10 +75,10 @@ constexpr quo::FieldTable kTable{
     "SpectralWindows",
     QUO_FIELD(AzMatchedFilterType),
     QUO_FIELD(RgMatchedFilterType),
-    QUO_FIELD(RgMatchedFilterCoef),
-    QUO_FIELD(AzMatchedFilterCoef),
-    QUO_FIELD(RgLookBandwidth),
-    QUO_FIELD(AzLookBandwidth),
+    QUO_FIELD(RgMatchedFilterCoef, quo::between(0.0, 1.0)),
+    QUO_FIELD(AzMatchedFilterCoef, quo::between(0.0, 1.0)),
+    QUO_FIELD(RgLookBandwidth, quo::at_least(0.0)),
+    QUO_FIELD(AzLookBandwidth, quo::at_least(0.0)),
 };
 }  // namespace windows
 

@@ -12,45 +12,6 @@ namespace {
 
 constexpr double kMaxInt = std::numeric_limits<std::int32_t>::max();
 
-using Obj = DataSetInfo_Obj;
-// The optional fields are those whose keys may also be missing in a parameter file.
-constexpr quo::FieldTable kTable{
-    "DataSetInfo",
-    QUO_FIELD(OrbitNumber),
-    QUO_FIELD(Track),
-    QUO_FIELD(SenseDate),
-    QUO_FIELD(SceneID),
-    QUO_FIELD(Description),
-    QUO_FIELD(AcquisitionStation),
-    QUO_FIELD(ProcessingCenter),
-    QUO_FIELD(ProcessingDate),
-    QUO_FIELD(ProcessingSoftware),
-    QUO_FIELD(SceneHeading),
-    QUO_FIELD(OrbitConfiguration),
-    QUO_FIELD(Polarization),
-    QUO_FIELD(Swath),
-    QUO_FIELD(SWST_MIN),
-    QUO_FIELD(SWST_MAX),
-    QUO_FIELD(RO_REF),
-    QUO_FIELD(RangeLooks, quo::bounds(1, 1000)),
-    QUO_FIELD(RangeBandwidth),
-    QUO_FIELD(ExternalCalibrationFactor),
-    QUO_FIELD(Projection),
-    QUO_FIELD(ImageType, quo::kOptional),
-    QUO_FIELD(RGAntenna_flag, quo::bounds(0, 1), quo::kOptional),
-    QUO_FIELD(AZAntenna_flag, quo::bounds(0, 1), quo::kOptional),
-    QUO_FIELD(SpreadLoss_flag, quo::bounds(0, 1), quo::kOptional),
-    QUO_FIELD(DroopGain_flag, quo::bounds(0, 1), quo::kOptional),
-    QUO_FIELD(RGAntenna_AltitudeCorr_flag, quo::bounds(0, 1), quo::kOptional),
-    QUO_FIELD(NoiseCorr_flag, quo::bounds(0, 1), quo::kOptional),
-    QUO_FIELD(SensorName, quo::kOptional),
-    QUO_FIELD(AcquisitionMode, quo::kOptional),
-    QUO_FIELD(RefSystem, quo::kOptional),
-    QUO_FIELD(UnitType, quo::kOptional),
-    QUO_FIELD(MissingLines, quo::bounds(0, kMaxInt), quo::kOptional),
-    QUO_FIELD(LookDirection, quo::bounds(0, kMaxInt), quo::kOptional, quo::kXmlOnly),
-};
-
 // The texts of the enumerations, by value; 0 is the text of what is not set.
 constexpr std::string_view kImageTypes[] = {
     "NOT SET",
@@ -78,6 +39,48 @@ constexpr std::string_view kUnitTypes[] = {
     "UNIT TYPE UNDEFINED", "VOLT", "VOLT^2", "VOLTcomplex", "meter", "Radian", "Degree", "sec"};
 constexpr std::string_view kRefSystems[] = {"REFERENCE SYSTEM UNDEFINED", "WGS84", "EGM84"};
 
+constexpr std::string_view kPolarizations[] = {"H/H", "V/V", "H/V", "V/H"};  // by number
+
+using Obj = DataSetInfo_Obj;
+// The optional fields are those whose keys may also be missing in a parameter file.
+constexpr quo::FieldTable kTable{
+    "DataSetInfo",
+    QUO_FIELD(OrbitNumber),
+    QUO_FIELD(Track),
+    QUO_FIELD(SenseDate, quo::kDate),
+    QUO_FIELD(SceneID),
+    QUO_FIELD(Description),
+    QUO_FIELD(AcquisitionStation),
+    QUO_FIELD(ProcessingCenter),
+    QUO_FIELD(ProcessingDate, quo::kDate),
+    QUO_FIELD(ProcessingSoftware),
+    QUO_FIELD(SceneHeading, quo::between(-360.0, 360.0)),
+    QUO_FIELD(OrbitConfiguration),
+    QUO_FIELD(Polarization, quo::one_of(kPolarizations)),
+    QUO_FIELD(Swath),
+    QUO_FIELD(SWST_MIN, quo::at_least(0.0)),
+    QUO_FIELD(SWST_MAX, quo::at_least(0.0)),
+    QUO_FIELD(RO_REF, quo::above(0.0)),
+    QUO_FIELD(RangeLooks, quo::bounds(1, 1000)),
+    QUO_FIELD(RangeBandwidth, quo::at_least(0.0)),
+    QUO_FIELD(ExternalCalibrationFactor),
+    QUO_FIELD(Projection, quo::one_of(kProjections)),
+    QUO_FIELD(ImageType, quo::one_of(kImageTypes), quo::kOptional),
+    QUO_FIELD(RGAntenna_flag, quo::bounds(0, 1), quo::kOptional),
+    QUO_FIELD(AZAntenna_flag, quo::bounds(0, 1), quo::kOptional),
+    QUO_FIELD(SpreadLoss_flag, quo::bounds(0, 1), quo::kOptional),
+    QUO_FIELD(DroopGain_flag, quo::bounds(0, 1), quo::kOptional),
+    QUO_FIELD(RGAntenna_AltitudeCorr_flag, quo::bounds(0, 1), quo::kOptional),
+    QUO_FIELD(NoiseCorr_flag, quo::bounds(0, 1), quo::kOptional),
+    QUO_FIELD(SensorName, quo::kFilled, quo::kOptional),
+    QUO_FIELD(AcquisitionMode, quo::one_of(kAcqModes), quo::kOptional),
+    QUO_FIELD(RefSystem, quo::one_of(kRefSystems), quo::kOptional),
+    QUO_FIELD(UnitType, quo::one_of(kUnitTypes), quo::kOptional),
+    QUO_FIELD(MissingLines, quo::bounds(0, kMaxInt), quo::kOptional),
+    // A look sign, which the registered bounds do not tell: left is -1.
+    QUO_FIELD(LookDirection, quo::bounds(0, kMaxInt), quo::between(-1, 1), quo::kOptional, quo::kXmlOnly),
+};
+
 using Texts = std::span<const std::string_view>;
 
 bool is_listed(Texts texts, int value) { return value >= 0 && static_cast<std::size_t>(value) < texts.size(); }
@@ -96,7 +99,6 @@ struct NumberedText {
     std::string_view text;
     int number;
 };
-constexpr NumberedText kPolarizations[] = {{"H/H", 0}, {"V/V", 1}, {"H/V", 2}, {"V/H", 3}};
 // Deliberate: SS1 is 7, where the order of the others would make it 1.
 constexpr NumberedText kSwaths[] = {{"SS1", 7}, {"SS2", 2}, {"SS3", 3}, {"SS4", 4}, {"SS5", 5}, {"IS1", 0},
                                     {"IS2", 1}, {"IS3", 2}, {"IS4", 3}, {"IS5", 4}, {"IS6", 5}, {"IS7", 6}};
@@ -150,5 +152,8 @@ int DataSetInfo_Obj::fillQUOREL() {
     quo::copy_bounded(ProcessingCenter, "QUOREL Vestra");
     return QUO_OK;
 }
-int DataSetInfo_Obj::getPolarizationNbr() const { return number_of(Polarization, kPolarizations); }
+int DataSetInfo_Obj::getPolarizationNbr() const {
+    const auto* text = std::ranges::find(kPolarizations, std::string_view{Polarization});
+    return text == std::end(kPolarizations) ? kUnknownNumber : static_cast<int>(text - std::begin(kPolarizations));
+}
 int DataSetInfo_Obj::getISNbr() const { return number_of(Swath, kSwaths); }

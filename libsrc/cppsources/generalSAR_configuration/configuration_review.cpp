@@ -1,5 +1,4 @@
-#include <cmath>
-#include <cstdint>
+#include <cstddef>
 #include <map>
 #include <memory>
 #include <new>
@@ -11,14 +10,12 @@
 #include "quo_base/generalSAR_configuration.h"
 #include "quorelxmllib/header_document.h"
 #include "quorelxmllib/header_session.h"
-#include "sarutillib/number_text.h"
 
 namespace {
 
 using Record = GeneralSAR_ConfigurationRecord;
 
 constexpr const char* kSource = "generalSAR_configuration";
-constexpr std::size_t kLongestQuote = 40;
 
 std::string_view name_of(const xmlNode* node) { return reinterpret_cast<const char*>(node->name); }
 
@@ -27,39 +24,6 @@ std::string_view trimmed(std::string_view text) {
     const auto first = text.find_first_not_of(kBlanks);
     if (first == std::string_view::npos) return {};
     return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
-}
-
-std::string quoted(std::string_view text) {
-    const bool cut = text.size() > kLongestQuote;
-    return '"' + std::string{text.substr(0, kLongestQuote)} + (cut ? "...\"" : "\"");
-}
-
-std::string digits(double value) { return quo::format_exact(value).data; }
-
-std::string count_reason(int count, int expected) {
-    return "has " + std::to_string(count) + (count == 1 ? " value, not " : " values, not ") +
-           std::to_string(expected);
-}
-
-// What is wrong with one value, or nothing.
-std::string value_reason(const parElement& element, std::string_view raw) {
-    if (element.type == parElement::typeString) {
-        if (raw.size() < element.room) return "";
-        return "has " + std::to_string(raw.size()) + " bytes, more than " + std::to_string(element.room - 1);
-    }
-    const std::string_view text = trimmed(raw);
-    const bool whole = element.type == parElement::typeInt;
-    const auto number = quo::scan_double(text);
-    const std::size_t length = whole ? quo::scan_int64(text).length : number.length;
-    if (length == 0 || length != text.size())
-        return quoted(text) + (whole ? " is no whole number" : " is no number");
-    if (!std::isfinite(number.value)) return quoted(text) + " is not finite";
-    const bool bounded = element.minimum != 0.0 || element.maximum != 0.0;
-    if (bounded && number.value < element.minimum)
-        return std::string{text} + " lies below " + digits(element.minimum);
-    if (bounded && number.value > element.maximum)
-        return std::string{text} + " lies above " + digits(element.maximum);
-    return "";
 }
 
 /** Goes through the values of an array as they are read: `val` elements, or else one list. */
@@ -72,13 +36,14 @@ public:
         if (count_ == 0) see_list(quo::NodeText{const_cast<xmlNode*>(node)});
     }
     [[nodiscard]] std::string reason() const {
-        return count_ != element_.count ? count_reason(count_, element_.count) : reason_;
+        const std::string wrong = element_.countDefect(count_);
+        return wrong.empty() ? reason_ : wrong;
     }
 
 private:
     void see(std::string_view text) {
         ++count_;
-        if (reason_.empty()) reason_ = value_reason(element_, text);
+        if (reason_.empty()) reason_ = element_.defect(text);
     }
     void see_list(std::string_view list) {
         while (!trimmed(list).empty()) {
@@ -89,7 +54,7 @@ private:
     }
 
     const parElement& element_;
-    int count_ = 0;
+    std::size_t count_ = 0;
     std::string reason_;
 };
 
@@ -135,7 +100,7 @@ private:
         if (std::exchange(expected.seen, true)) return find(name_of(node), "stands there more than once");
         std::string reason = expected.element.count > 1
                                  ? ArrayCheck{expected.element, node}.reason()
-                                 : value_reason(expected.element, quo::NodeText{const_cast<xmlNode*>(node)});
+                                 : expected.element.defect(quo::NodeText{const_cast<xmlNode*>(node)});
         if (!reason.empty()) find(name_of(node), std::move(reason));
     }
 

@@ -6,6 +6,7 @@
 #include <concepts>
 #include <cstddef>
 #include <cstdint>
+#include <limits>
 #include <memory>
 #include <new>
 #include <optional>
@@ -37,6 +38,7 @@ struct FieldValue {
     bool mandatory;
     InProfile in_profile;
     std::size_t room;  // bytes of a text
+    parRule rule;
 };
 
 /** Way to the registry's protected operations for the field tables and the header sessions. */
@@ -69,6 +71,7 @@ struct Field {
     bool mandatory = true;
     InProfile in_profile = InProfile::kMandatory;
     std::size_t room = 0;
+    parRule rule;
     const char *unit = "", *meaning = "";
 
     void* (*address)(Owner&) = nullptr;  // first value; null while an array is not allocated
@@ -88,7 +91,7 @@ struct Field {
     [[nodiscard]] FieldValue at(Owner& object) const {
         void* pointer = address(object);
         const std::int32_t count = pointer ? wanted_count(object).value_or(0) : 0;
-        return {name, key, type, pointer, count, minimum, maximum, mandatory, in_profile, room};
+        return {name, key, type, pointer, count, minimum, maximum, mandatory, in_profile, room, rule};
     }
 };
 
@@ -99,6 +102,25 @@ struct Bounds {
 };
 /** The values that make sense; not enforced on reading. */
 constexpr Bounds bounds(double minimum, double maximum) { return {minimum, maximum}; }
+
+/** Which numbers make sense where a field is registered without bounds, or with other ones that older readers
+ * rely on. */
+constexpr parRule between(double lowest, double highest) {
+    return {.bounded = true, .lowest = lowest, .highest = highest};
+}
+constexpr parRule at_least(double lowest) { return between(lowest, std::numeric_limits<double>::infinity()); }
+constexpr parRule above(double limit) {
+    parRule rule = at_least(limit);
+    rule.above_lowest = true;
+    return rule;
+}
+/** The only texts of a field, in an array that stays. */
+constexpr parRule one_of(std::span<const std::string_view> texts) {
+    return {.text = parRule::listedText, .texts = texts};
+}
+/** A text that says something, and one that is a date. */
+inline constexpr parRule kFilled{.text = parRule::filledText};
+inline constexpr parRule kDate{.text = parRule::dateText};
 
 struct Note {
     const char *unit, *meaning;
@@ -141,6 +163,10 @@ template <typename Owner>
 constexpr void apply(Field<Owner>& field, Bounds rule) {
     field.minimum = rule.minimum;
     field.maximum = rule.maximum;
+}
+template <typename Owner>
+constexpr void apply(Field<Owner>& field, parRule rule) {
+    field.rule = rule;
 }
 template <typename Owner>
 constexpr void apply(Field<Owner>& field, Note rule) {
@@ -401,7 +427,8 @@ FieldTable(const char*, Field<Owner>, Rest...) -> FieldTable<Owner, 1 + sizeof..
 
 /** A row for a member of `Obj`, the class that the file's `using Obj = ...` names. After the member: the
  * parameter-file key where it differs, and rules (quo::bounds, quo::element, quo::kOptional,
- * quo::kProfileOptional, quo::kXmlOnly, QUO_LENGTH). */
+ * quo::kProfileOptional, quo::kXmlOnly, QUO_LENGTH; for checks alone quo::between, quo::at_least, quo::above,
+ * quo::one_of, quo::kFilled, quo::kDate). */
 #define QUO_FIELD(member, ...) quo::field<Obj, &Obj::member>(#member __VA_OPT__(, ) __VA_ARGS__)
 /** Rule of an array member: its length is an int32_t member of `Obj`, times an optional number of values each. */
 #define QUO_LENGTH(member, ...) quo::length<Obj, &Obj::member>(__VA_ARGS__)

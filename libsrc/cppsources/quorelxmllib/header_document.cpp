@@ -56,14 +56,16 @@ std::unique_ptr<xmlParserCtxt, decltype(&xmlFreeParserCtxt)> make_parser() {
     return {parser, &xmlFreeParserCtxt};
 }
 
-/** Parses with `read(parser)`. 0, 1 for what is no XML that we accept, or 7. */
+/** Parses with `read(parser)`. 0, 1 for what is no XML that we accept, with the reason in `defect` where that is
+ * asked for, or 7. */
 template <typename Read>
-int parse(XmlTree& tree, Read read) {
+int parse(XmlTree& tree, Read read, std::string* defect = nullptr) {
     const XmlErrors errors;
     const auto parser = make_parser();
     if (!parser) return QUO_NO_MEMORY;
     errno = 0;
     tree.reset(read(parser.get()));
+    if (defect) *defect = errors.first();
     // A text that is too long counts as a lack of memory too; what fails without an error never got to parse.
     const bool unexplained = !tree && parser->errNo == XML_ERR_OK;
     if (errors.out_of_memory() || unexplained) return QUO_NO_MEMORY;
@@ -76,13 +78,14 @@ int parse(XmlTree& tree, Read read) {
 
 }  // namespace
 
-int HeaderDocument::load(const char* file, std::shared_ptr<HeaderDocument>& document) {
+int HeaderDocument::load(const char* file, std::shared_ptr<HeaderDocument>& document, std::string* defect) {
     HeaderSource source;
     if (const int status = source.open(file)) return status;
     XmlTree tree;
-    const int status = parse(tree, [&](xmlParserCtxt* parser) {
+    const auto read = [&](xmlParserCtxt* parser) {
         return xmlCtxtReadIO(parser, HeaderSource::read, nullptr, &source, nullptr, nullptr, kHeaderOptions);
-    });
+    };
+    const int status = parse(tree, read, defect);
     if (const int failed = source.status()) return failed;
     if (status != QUO_OK) return status;
     document = std::make_shared<HeaderDocument>(tree.get(), source.bytes());

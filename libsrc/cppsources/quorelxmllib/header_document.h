@@ -58,8 +58,9 @@ class HeaderDocument {
 public:
     /** Parses a header file. 0; 1 when there is none or it is no XML that we accept (see quorelxml_v2.h); 4 when
      * it is there but cannot be read, 7 when it does not fit into memory: then nothing may take its place, and
-     * errno may tell why. */
-    static int load(const char* file, std::shared_ptr<HeaderDocument>& document);
+     * errno may tell why. `defect`, where it is given, tells what is no XML and on which line; empty where it all
+     * is. */
+    static int load(const char* file, std::shared_ptr<HeaderDocument>& document, std::string* defect = nullptr);
     /** As load(), but a fresh document takes the place of what is no header: 0. With 4 the fresh document only
      * stands in for one that cannot be read. Null with 7. */
     static int load_or_create(const char* file, std::shared_ptr<HeaderDocument>& document);

@@ -5,7 +5,10 @@
 #include <libxml/xmlerror.h>
 
 #include <cstdint>
+#include <string>
+#include <string_view>
 
+#include "sarutillib/bounded_text.h"
 #include "sarutillib/file_io.h"
 
 namespace quo {
@@ -19,7 +22,9 @@ class XmlErrors {
 public:
     XmlErrors() noexcept : handler_{xmlStructuredError}, context_{xmlStructuredErrorContext} {
         xmlSetStructuredErrorFunc(this, [](void* self, xmlError* error) {
-            if (error->code == XML_ERR_NO_MEMORY) static_cast<XmlErrors*>(self)->out_of_memory_ = true;
+            auto& errors = *static_cast<XmlErrors*>(self);
+            if (error->code == XML_ERR_NO_MEMORY) errors.out_of_memory_ = true;
+            if (errors.line_ == 0) errors.note(*error);
         });
     }
     ~XmlErrors() { xmlSetStructuredErrorFunc(context_, handler_); }
@@ -27,11 +32,23 @@ public:
     XmlErrors& operator=(const XmlErrors&) = delete;
 
     [[nodiscard]] bool out_of_memory() const noexcept { return out_of_memory_; }
+    /** The first error, "line 17: ..."; empty where there was none. */
+    [[nodiscard]] std::string first() const {
+        return line_ > 0 ? "line " + std::to_string(line_) + ": " + message_ : "";
+    }
 
 private:
+    void note(const xmlError& error) noexcept {
+        const std::string_view text = error.message ? error.message : "";
+        copy_bounded(message_, text.substr(0, text.find('\n')));
+        line_ = error.line;
+    }
+
     xmlStructuredErrorFunc handler_;
     void* context_;
     bool out_of_memory_ = false;
+    int line_ = 0;
+    char message_[256] = "";
 };
 
 /** A header file as libxml2 reads it. */

@@ -236,6 +236,14 @@ int quorelxml::insertInstruction(const char* name, const char* content) noexcept
     return document_->insert_instruction(name, content) ? frame.success() : out_of_memory(frame);
 }
 
+std::string quorelxml::xmlDefect(const char* file_name) {
+    std::shared_ptr<HeaderDocument> document;
+    std::string defect;
+    (void)HeaderDocument::load(file_name, document, &defect);
+    CallFrame::drop_errno();
+    return defect;
+}
+
 // --- looking up -------------------------------------------------------------------------------------------------
 
 int quorelxml::setXpathExpression(int channel, std::string& expression) {

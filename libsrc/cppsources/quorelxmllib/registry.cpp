@@ -379,6 +379,7 @@ int GeneralSAR_Base::readhdr(const char*) { return QUO_OK; }
 namespace quo {
 
 void RegistryAccess::add(GeneralSAR_BaseXML& object, const FieldValue& field) {
+    if (object.cursor_ < object.element_count_) object.elements_[object.cursor_].rule = field.rule;
     if (field.type == parElement::typeString)
         (void)object.addElementText(field.name, static_cast<char*>(field.pointer), field.room, field.mandatory);
     else

@@ -5,7 +5,9 @@
 #include <cstring>
 #include <ctime>
 #include <optional>
+#include <utility>
 
+#include "diagnosticslib/call_stack.h"
 #include "diagnosticslib/errno_kept.h"
 #include "quo_base/ckerr.h"
 #include "sarutillib/bounded_text.h"
@@ -177,7 +179,10 @@ extern "C" int quo_add_log(const char* text) noexcept {
 }
 
 extern "C" void quo_check(int error_number, int line, const char* function, const char* file) noexcept {
+    if (error_number != 0) quo::call_stack.system_error = error_number;
     if (error_number == 0 || !report.is_open()) return;
     const quo::ErrnoKept kept;
     quo_add_report(std::strerror(error_number), QUO_ERROR, line, function, file);
 }
+
+extern "C" int quo_take_system_error(void) noexcept { return std::exchange(quo::call_stack.system_error, 0); }

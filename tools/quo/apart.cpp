@@ -1,0 +1,47 @@
+#include "apart.h"
+
+#include <filesystem>
+
+#include "failure.h"
+#include "product.h"
+
+namespace tool {
+namespace {
+
+void append(std::vector<std::string>& names, const std::vector<std::string>& more) {
+    names.insert(names.end(), more.begin(), more.end());
+}
+
+}  // namespace
+
+bool same_file(const std::string& a, const std::string& b) {
+    std::error_code error;
+    return std::filesystem::is_regular_file(a, error) && std::filesystem::equivalent(a, b, error);
+}
+
+std::vector<std::string> raster_files(const std::string& raster) { return {raster, raster + ".hdr"}; }
+
+std::vector<std::string> header_files(const std::string& header) {
+    const auto raster = raster_of(header);
+    return raster ? std::vector{header, *raster} : std::vector{header};
+}
+
+void require_apart(const std::vector<std::string>& read, const std::vector<std::string>& written) {
+    for (std::size_t i = 0; i < written.size(); ++i) {
+        for (const std::string& input : read) {
+            if (!same_file(written[i], input)) continue;
+            throw Failure(written[i] + ": would replace " + (written[i] == input ? "what" : input + ", which") +
+                          " the job reads");
+        }
+        for (std::size_t k = 0; k < i; ++k)
+            if (same_file(written[i], written[k]))
+                throw Failure(written[i] + ": is the same file as " + written[k]);
+    }
+}
+
+void require_raster_apart(const std::string& in, const std::string& out) {
+    if (same_file(out, in) && same_file(out + ".hdr", in + ".hdr")) return;
+    require_apart(raster_files(in), raster_files(out));
+}
+
+}  // namespace tool
