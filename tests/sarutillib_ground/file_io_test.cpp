@@ -194,28 +194,6 @@ TEST_F(AtomicFileTest, RefusesAFileThatMayNotBeWritten) {
     expect_header("old", 1);
 }
 
-// The disk fills up at every byte of the new content: all of it arrives or the old file stays.
-TEST_F(AtomicFileTest, KeepsTheOldFileWhicheverWriteFails) {
-    const std::string content = "first piece, second piece, third piece";
-    for (rlim_t room = 0; room <= content.size(); ++room) {
-        SCOPED_TRACE(room);
-        bool written = true, replaced = false;
-        int error = 0;
-        {
-            const test::FullDisk limit{room};
-            AtomicFile file{name_.c_str()};
-            for (std::size_t at = 0; at < content.size(); at += 13) written = file.write(content.substr(at, 13));
-            replaced = file.commit();
-            error = errno;
-        }
-        const bool fits = room == content.size();
-        EXPECT_EQ(written, fits);
-        EXPECT_EQ(replaced, fits);
-        EXPECT_EQ(error, fits ? 0 : EFBIG);
-        expect_header(fits ? content : "old");
-    }
-}
-
 /** Rights in a folder where the file may be written but nothing put beside it or in its place. */
 struct ClosedFolder {
     const char* name;

@@ -5,7 +5,8 @@
 
 namespace test {
 
-enum class News { kThrowing, kReturningNull, kAll };
+/** Which operators fail; kNone where is_refused() is asked below them. */
+enum class News { kThrowing, kReturningNull, kAll, kNone };
 
 /** Lets `room` more allocations by such operators succeed; after them one fails, or all do. */
 void fail_news(long room, News which = News::kAll, bool once = false);

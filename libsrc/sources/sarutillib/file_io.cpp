@@ -92,12 +92,13 @@ std::string random_name() {
     return {text.data(), format_bounded(text.data(), text.size(), ".quo-%016llx.tmp", number)};
 }
 
-/** Whether `name` is still the name of the open file. */
+/** Whether `name` is still the name of the open file; where it is not, errno is ENOENT. */
 bool is_entry(int folder, const std::string& name, int file) noexcept {
     struct stat entry {
     }, opened{};
-    return ::fstat(file, &opened) == 0 && ::fstatat(folder, name.c_str(), &entry, AT_SYMLINK_NOFOLLOW) == 0 &&
-           entry.st_dev == opened.st_dev && entry.st_ino == opened.st_ino;
+    if (::fstat(file, &opened) != 0 || ::fstatat(folder, name.c_str(), &entry, AT_SYMLINK_NOFOLLOW) != 0)
+        return false;
+    return (entry.st_dev == opened.st_dev && entry.st_ino == opened.st_ino) || refuse(ENOENT);
 }
 
 bool lock(int file) noexcept {
@@ -279,12 +280,19 @@ bool AtomicFile::create_temporary(unsigned mode) {
 }
 
 bool AtomicFile::create_in_slot(const std::string& name, unsigned mode) {
+    temporary_ = name;  // needs memory, for want of which no file must stay behind
     file_ = Descriptor{::openat(folder_.get(), name.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, mode)};
+    if (!file_) temporary_.clear();
     if (!file_) return false;
-    temporary_ = name;
     // Between its making and its locking another process can take the file for one that was left behind. Where
     // there are no locks nothing is swept either.
-    if ((lock(file_.get()) || errno != EWOULDBLOCK) && is_entry(folder_.get(), name, file_.get())) return true;
+    if (lock(file_.get()) || errno != EWOULDBLOCK) {
+        if (is_entry(folder_.get(), name, file_.get())) return true;
+        if (errno != ENOENT) {  // nobody can tell
+            discard();
+            return false;
+        }
+    }
     temporary_.clear();
     file_ = Descriptor{};
     return refuse(EEXIST);

@@ -1,0 +1,326 @@
+#include "support/faults.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <libxml/xmlmemory.h>
+#include <sys/mman.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <csignal>
+#include <cstdlib>
+#include <cstring>
+#include <filesystem>
+#include <map>
+#include <random>
+
+#include "faults/jobs.h"
+#include "quo_base/ckerr.h"
+#include "quo_base/datafile.h"
+#include "support/diagnostics.h"
+#include "support/failing_new.h"
+
+// Every system call of every job that saves or reads fails in turn, in each way that it can, once and from then
+// on; so does every allocation; and the process is killed before each call. One rule holds for all: a file is what
+// it was or what it was to become, and success means the latter.
+
+// NOLINTBEGIN(bugprone-reserved-identifier): the linker's names. It sends the allocations of the library and of
+// this program here; those of libxml2 and of the operators new come along.
+extern "C" {
+void* __real_malloc(std::size_t size);
+void* __real_calloc(std::size_t count, std::size_t size);
+void* __real_realloc(void* block, std::size_t size);
+void* __wrap_malloc(std::size_t size) { return test::is_refused() ? nullptr : __real_malloc(size); }
+void* __wrap_calloc(std::size_t count, std::size_t size) {
+    return test::is_refused() ? nullptr : __real_calloc(count, size);
+}
+void* __wrap_realloc(void* block, std::size_t size) {
+    return test::is_refused() ? nullptr : __real_realloc(block, size);
+}
+}
+// NOLINTEND(bugprone-reserved-identifier)
+
+namespace {
+
+using test::Call;
+using test::Job;
+using test::Promise;
+
+void* xml_malloc(std::size_t size) { return std::malloc(size); }
+void* xml_realloc(void* block, std::size_t size) { return std::realloc(block, size); }
+char* xml_strdup(const char* text) {
+    const std::size_t size = std::strlen(text) + 1;
+    void* const copy = std::malloc(size);
+    return copy ? static_cast<char*>(std::memcpy(copy, text, size)) : nullptr;
+}
+
+/** A system call and what it can say. */
+struct Failing {
+    const char* name;
+    Call call;
+    std::vector<int> errors;
+};
+const std::vector<Failing> kFailing = {
+    {"open", Call::kOpen, {EIO, EMFILE, EACCES, ESTALE, ENOSPC, EINTR}},
+    {"read", Call::kRead, {EIO, ESTALE, EINTR, test::kShort}},
+    {"write", Call::kWrite, {EIO, ENOSPC, EDQUOT, EINTR, test::kShort}},
+    {"fsync", Call::kSync, {EIO, ENOSPC, EINTR}},
+    {"close", Call::kClose, {EIO, EDQUOT}},
+    {"rename", Call::kRename, {EIO, ENOSPC, EACCES, EINVAL}},
+    {"link", Call::kLink, {EIO, EPERM}},
+    {"ftruncate", Call::kResize, {EIO, ENOSPC, EINTR}},
+    {"fchmod", Call::kMode, {EPERM}},
+    {"fchown", Call::kOwner, {EPERM}},
+    {"flock", Call::kLock, {ENOLCK, EINTR}},
+    {"copy_file_range", Call::kCopy, {EIO, ENOSPC, test::kShort}},
+    {"stat", Call::kStat, {EIO, ESTALE, EACCES}},
+    {"access", Call::kAccess, {EIO, EACCES}},
+    {"readlink", Call::kReadLink, {EIO, EACCES}},
+    {"memory", Call::kMemory, {ENOMEM}},
+    {"kill", Call::kAny, {test::kKill}},
+};
+
+/** Permissions and bytes of the files of a folder, by name. */
+using State = std::map<std::string, std::string>;
+State state_of(const std::string& folder) {
+    State state;
+    for (const auto& entry : std::filesystem::directory_iterator{folder})
+        state[entry.path().filename().string()] =
+            std::to_string(static_cast<unsigned>(entry.status().permissions())) + ' ' +
+            test::read_text(entry.path());
+    return state;
+}
+void restore(const std::string& folder, const State& state) {
+    std::filesystem::remove_all(folder);
+    std::filesystem::create_directory(folder);
+    for (const auto& [name, content] : state) {
+        const std::string file = folder + '/' + name;
+        test::write_text(file, content.substr(content.find(' ') + 1));
+        chmod(file.c_str(), static_cast<mode_t>(std::stoul(content)));
+    }
+}
+/** Whether a file is as it is in a state. */
+bool holds(const State& state, const State::value_type& file) {
+    const auto found = state.find(file.first);
+    return found != state.end() && found->second == file.second;
+}
+
+struct Outcome {
+    int status = 0, signal = 0;
+    long descriptors = 0;
+    bool reached = false;
+    std::string output, said;  // of the tool, where it succeeds and where it fails
+};
+
+/** Runs one job again and again, each time in a process of its own and on the same files. */
+class Bench {
+public:
+    explicit Bench(const Job& job) : job_{job}, shared_{memfd_create("watch", 0)} {
+        if (ftruncate(shared_, sizeof *watch_) != 0) throw std::runtime_error("no memory to share");
+        watch_ = static_cast<test::Watch*>(
+            mmap(nullptr, sizeof *watch_, PROT_READ | PROT_WRITE, MAP_SHARED, shared_, 0));
+        init_ckerr_locking();
+        std::filesystem::create_directory(folder_);
+        test::lay_out(folder_);
+        old_ = state_of(folder_);
+        if (job.prepare) run_ = job.prepare(folder_);
+        whole_ = run();
+        fresh_ = state_of(folder_);
+        reset();
+        EXPECT_TRUE(whole_.status == 0 && whole_.signal == 0) << test::read_text(beside_.file("err"));
+        EXPECT_EQ(old_ == fresh_, job.promise == Promise::kUnchanged);
+    }
+    ~Bench() {
+        munmap(watch_, sizeof *watch_);
+        close(shared_);
+    }
+    Bench(const Bench&) = delete;
+    Bench& operator=(const Bench&) = delete;
+
+    Outcome run(const test::Fault& fault = {}) { return wait(start(fault)); }
+    pid_t start(const test::Fault& fault, bool endlessly = false);
+    Outcome wait(pid_t child) const;
+    void reset() {
+        if (state_of(folder_) != old_) restore(folder_, old_);
+    }
+    /** Which rule an outcome breaks; empty where none. */
+    [[nodiscard]] std::string breach(const test::Fault& fault, const Outcome& outcome) const;
+    std::string breach_after_kill();
+
+private:
+    [[noreturn]] void be_library(const test::Fault& fault, bool endlessly);
+    [[noreturn]] void be_tool() const;
+
+    const Job& job_;
+    test::TemporaryFolder beside_;
+    const std::string folder_ = beside_.file("folder");
+    test::Run run_;
+    State old_, fresh_;
+    Outcome whole_;
+    const int shared_;
+    test::Watch* watch_ = nullptr;
+};
+
+pid_t Bench::start(const test::Fault& fault, bool endlessly) {
+    *watch_ = {};
+    watch_->fault = fault;
+    std::strncpy(watch_->folder, folder_.c_str(), sizeof watch_->folder - 1);
+    const pid_t child = fork();
+    if (child != 0) return child;
+    if (!freopen(beside_.file("out").c_str(), "w", stdout) || !freopen(beside_.file("err").c_str(), "w", stderr))
+        _exit(99);
+    if (job_.verb) be_tool();
+    be_library(fault, endlessly);
+}
+
+void Bench::be_library(const test::Fault& fault, bool endlessly) {
+    init_report(beside_.file("report").c_str(), "faults", 1);
+    test::start_watching(watch_);
+    int status = 0;
+    do {
+        const bool refuses = fault.call == Call::kMemory;
+        if (refuses) test::fail_news(fault.nth - 1, test::News::kNone, !fault.forever);
+        watch_->reached = refuses;  // should the refusal end the process
+        try {
+            status = run_();
+        } catch (const std::bad_alloc&) {
+            status = QUO_NO_MEMORY;  // jobs that must not let it out are noexcept
+        }
+        if (refuses) watch_->reached = test::stop_failing();
+    } while (endlessly);
+    run_ = nullptr;  // files that the job's objects hold open are closed with them
+    watch_->returned = true;
+    _exit(status != 0 ? 1 : 0);
+}
+
+void Bench::be_tool() const {
+#ifdef QUO_TOOL
+    std::istringstream line{job_.verb};
+    std::vector<std::string> words{QUO_TOOL};
+    for (std::string word; line >> word;) words.push_back(word[0] == '@' ? folder_ + word.substr(1) : word);
+    std::vector<char*> arguments;
+    for (std::string& word : words) arguments.push_back(word.data());
+    arguments.push_back(nullptr);
+    setenv("LD_PRELOAD", QUO_FAULTS, 1);
+    setenv("QUO_FFT_ENGINE", "quo", 1);
+    setenv(test::kWatchVariable, std::to_string(shared_).c_str(), 1);
+    execv(QUO_TOOL, arguments.data());
+#endif
+    _exit(99);
+}
+
+Outcome Bench::wait(pid_t child) const {
+    int ended = 0;
+    if (waitpid(child, &ended, 0) != child) throw std::runtime_error("the child is lost");
+    Outcome outcome{.descriptors = watch_->returned ? watch_->descriptors : 0, .reached = watch_->reached};
+    if (WIFEXITED(ended)) outcome.status = WEXITSTATUS(ended);
+    if (WIFSIGNALED(ended)) outcome.signal = WTERMSIG(ended);
+    if (job_.promise == Promise::kReports &&
+        test::read_text(beside_.file("report")).find("ERROR") != std::string::npos)
+        outcome.status = 1;
+    const bool succeeded = outcome.status == 0 && outcome.signal == 0;
+    (succeeded ? outcome.output : outcome.said) = test::read_text(beside_.file(succeeded ? "out" : "err"));
+    return outcome;
+}
+
+std::string Bench::breach(const test::Fault& fault, const Outcome& outcome) const {
+    const State now = state_of(folder_);
+    if (outcome.signal != 0) return "signal " + std::to_string(outcome.signal) + ' ' + outcome.said;
+    if (job_.promise == Promise::kSurvives) return "";
+    if (outcome.status == 0 && (now != fresh_ || outcome.output != whole_.output)) return "0 but not new";
+    if (outcome.status == 0 && outcome.reached && fault.call == Call::kSync && fault.error != EINTR)
+        return "0 but not on the disk";
+    if (outcome.status != 0 && job_.verb &&
+        !testing::Matches(testing::MatchesRegex("quo: [^\n]*\n"))(outcome.said))
+        return "says " + outcome.said;
+    if (outcome.status != 0 && fault.call != Call::kOpen && job_.promise != Promise::kTells &&
+        (fault.error == EINTR || fault.error == test::kShort))
+        return "not tried again";
+    if (job_.promise != Promise::kTells && now != old_ && now != fresh_) return "neither old nor new";
+    for (const auto& [name, content] : now)
+        if (!old_.contains(name) && !fresh_.contains(name)) return "leaves " + name;
+    return outcome.descriptors == 0 ? "" : "leaves a file open";
+}
+
+/** Each file is old or new, a raster has all samples of its description, and beside them is at most one file for
+ * each that was to be saved; the next save sweeps it. */
+std::string Bench::breach_after_kill() {
+    if (job_.promise == Promise::kTells || job_.promise == Promise::kSurvives) return "";
+    auto too_many = -std::ranges::count_if(fresh_, [&](const auto& file) { return !holds(old_, file); });
+    for (const auto& file : state_of(folder_)) {
+        if (holds(old_, file) || holds(fresh_, file)) continue;
+        if (old_.contains(file.first) || fresh_.contains(file.first)) return file.first + " neither old nor new";
+        ++too_many;
+    }
+    if (too_many > 0) return "too many files";
+    for (const char* name : {"/in.raw", "/out.raw", "/new.raw"}) {
+        DataFile raster;
+        std::error_code missing;
+        if (raster.read_hdr((folder_ + name).c_str()) == 0 &&
+            raster.rasterSize() > static_cast<std::int64_t>(std::filesystem::file_size(folder_ + name, missing)))
+            return name + std::string{" is shorter than its description says"};
+    }
+    if (run().status != 0) return "not saved again";
+    for (const auto& file : state_of(folder_))
+        if (!fresh_.contains(file.first)) return "the next save leaves " + file.first;
+    return "";
+}
+
+std::vector<std::string> breaches(Bench& bench, const Failing& failing, int error, bool forever) {
+    std::vector<std::string> found;
+    bool reached = true;
+    for (long nth = 1; reached; ++nth) {
+        const test::Fault fault{failing.call, error, nth, forever};
+        const Outcome outcome = bench.run(fault);
+        reached = outcome.reached;
+        const std::string breach =
+            reached && error == test::kKill ? bench.breach_after_kill() : bench.breach(fault, outcome);
+        if (!breach.empty()) found.push_back(std::to_string(nth) + (forever ? ". and later: " : ".: ") + breach);
+        bench.reset();
+    }
+    return found;
+}
+
+class Faults : public testing::TestWithParam<Job> {
+protected:
+    Faults() { xmlMemSetup(std::free, xml_malloc, xml_realloc, xml_strdup); }
+};
+
+TEST_P(Faults, LeaveOldOrNewAndSuccessMeansNew) {
+    Bench bench{GetParam()};
+    ASSERT_FALSE(HasFailure());
+    for (const Failing& failing : kFailing) {
+        if (failing.call == Call::kMemory && GetParam().verb) continue;
+        for (const int error : failing.errors)
+            for (const bool forever : {false, true}) {
+                if (forever && (error == EINTR || error == test::kKill)) continue;
+                SCOPED_TRACE(std::string{failing.name} + ' ' + (error > 0 ? strerrorname_np(error) : ""));
+                EXPECT_THAT(breaches(bench, failing, error, forever), testing::IsEmpty());
+            }
+    }
+}
+INSTANTIATE_TEST_SUITE_P(Jobs, Faults, testing::ValuesIn(test::jobs()),
+                         [](const auto& row) { return row.param.name; });
+
+// The same without knowledge of the calls: processes that save over and over are killed at any moment.
+TEST(Kill, LeavesOldOrNewAndOneTemporaryFileThatTheNextSaveSweeps) {
+    const char* const wanted = std::getenv("QUO_KILLS");
+    const long kills = wanted ? std::strtol(wanted, nullptr, 10) : 30;
+    std::vector<std::unique_ptr<Bench>> benches;
+    for (const Job& job : test::jobs())
+        if (job.killed) benches.push_back(std::make_unique<Bench>(job));
+    std::mt19937 random{17};
+    for (long i = 0; i < kills; ++i) {
+        Bench& bench = *benches[static_cast<std::size_t>(i) % benches.size()];
+        const pid_t child = bench.start({}, true);
+        usleep(std::uniform_int_distribution<useconds_t>{0, 30000}(random));
+        kill(child, SIGKILL);
+        bench.wait(child);
+        EXPECT_EQ(bench.breach_after_kill(), "") << i;
+        bench.reset();
+    }
+}
+
+}  // namespace

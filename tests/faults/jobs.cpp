@@ -1,0 +1,340 @@
+#include "faults/jobs.h"
+
+#include <algorithm>
+#include <array>
+#include <cstdlib>
+#include <filesystem>
+#include <memory>
+#include <ostream>
+
+#include "container/products.h"
+#include "quo_base/Coregist.h"
+#include "quo_base/ckerr.h"
+#include "quo_base/debugIO.h"
+#include "quo_base/gen_utils.h"
+#include "quo_base/generalSAR_configuration.h"
+#include "quo_base/profile.h"
+#include "quo_base/quorelReport.h"
+#include "quo_base/quorelxml_v2.h"
+#include "support/diagnostics.h"
+#include "support/raster.h"
+
+namespace {
+
+using test::file_in;
+using test::Run;
+using Folder = const std::string&;
+
+/** 0 is only said where everything is right; wrong values with a good status are worse than any crash. */
+int judged(int status, bool right) {
+    if (status == 0 && !right) std::abort();
+    return status;
+}
+
+std::shared_ptr<GeneralSAR> product() {
+    auto made = std::make_shared<GeneralSAR>();
+    test::fill_product(*made);
+    return made;
+}
+template <GSObject kObject>
+Run write_object(Folder folder) {
+    return [made = product(), file = file_in(folder, "product.hdr")]() noexcept {
+        return made->GSget(kObject)->writehdr(file);
+    };
+}
+constexpr char kProduct[] = "product.hdr", kNewProduct[] = "new.hdr";
+template <const char* kName>
+Run write_product(Folder folder) {
+    return [made = product(), file = file_in(folder, kName)]() noexcept { return made->GSwrite(file); };
+}
+Run read_product(Folder folder) {
+    const char* const file = file_in(folder, "whole.hdr");
+    auto whole = std::make_shared<GeneralSAR>(), read = std::make_shared<GeneralSAR>();
+    whole->GSread(file);
+    return [=] {
+        if ([&]() noexcept { return read->GSread(file); }() != 0) return 1;
+        const auto there = test::present_in(*read);
+        for (const GSObject object : there)
+            judged(0, test::differing_fields(*whole->GSget(object), *read->GSget(object)).empty());
+        return there == test::present_in(*whole) ? 0 : 1;
+    };
+}
+/** Orbits that are read, copied, re-sampled and checked: whatever fails, each has all of its vectors or none. */
+Run use_orbit(Folder folder) {
+    auto read = std::make_shared<GeneralSAROrbit>(), copy = std::make_shared<GeneralSAROrbit>();
+    auto record = std::make_shared<SAROrbitStateVectors_Obj>();
+    return [=, file = file_in(folder, "whole.hdr")] {
+        std::vector<SVFinding> findings;
+        int status = copy->SVCreate(1.5, 9.7, 12);
+        if (status == 0 && copy->nSV_n != 12) std::abort();
+        if (status == 0) status = record->readhdr(file);
+        if (status == 0) status = read->readhdr(file);
+        if (status == 0) status = read->clone(copy.get());
+        if (status == 0) status = copy->SVResample(3.0);
+        if (status == 0) status = copy->SVCheck(findings);
+        for (const auto& orbit : {read, copy})
+            judged(0, (orbit->pSV_m != nullptr) == (orbit->nSV_n > 0) && !orbit->pSV_m == !orbit->vSV_mOs);
+        judged(0, !record->pSV_m == !record->vSV_mOs);
+        return status;
+    };
+}
+
+Run write_configuration(Folder folder) {
+    auto made = std::make_shared<GeneralSAR_configuration>();
+    for (int i = 0; i < 6; ++i) made->GSenable(static_cast<GScObject>(i));
+    return [made, file = file_in(folder, "records.xml")] {
+        try {
+            return made->GSwrite(file, 1);
+        } catch (const quorelException&) {
+            return 1;
+        }
+    };
+}
+Run write_coregistration(Folder folder) {
+    return [made = std::make_shared<Coregist>(), file = file_in(folder, "product.hdr")] {
+        return made->writepar(file);
+    };
+}
+Run write_factor(Folder folder) {
+    auto tables = std::make_shared<EnvisatCalibrationFactors>();
+    tables->IM_HH[0] = 17.3;
+    return [tables, file = file_in(folder, "stripmap.hdr")] { return tables->writeFactor(file); };
+}
+
+template <typename Document, int (*kUse)(Document& document, const char* file)>
+Run with_document(Folder folder) {
+    return [document = std::make_shared<Document>(), file = file_in(folder, "product.hdr")] {
+        return kUse(*document, file);
+    };
+}
+int add_values(quorelxml& document, const char* file) {
+    const double values[] = {1.5, 2.5};
+    const char* text = "New";
+    if (const int status = document.initXmlFile(file)) return status;
+    if (const int status = document.writeDouble(2, "New/a", values, 2)) return status;
+    if (const int status = document.writeString(1, "New/b", &text, 1)) return status;
+    return document.write();
+}
+int add_instruction(quorelxmlPi& document, const char* file) {
+    const int status = document.initXmlFile(file, "New.xsl");
+    return status != 0 ? status : document.write();
+}
+int describe(quorelxml& document, const char* file) { return document.setDescription(file, "<New>"); }
+int read_values(quorelxml& document, const char* file) {
+    double value = 0.0;
+    if (document.initXmlFile(file) != 0) return 1;
+    const int status = document.readDouble(1, "SamplingConstants/prf_hz", &value, 1);
+    return judged(status, value != 0.0);
+}
+
+template <int (*kUse)(const char* file)>
+Run with_profile(Folder folder) {
+    return [file = file_in(folder, "a.par")] { return kUse(file); };
+}
+/** The copy always says 0: the files tell. */
+Run copy_profile(Folder folder) {
+    return [from = file_in(folder, "a.par"), to = file_in(folder, "out.csv")] {
+        (void)copyParameterFile(from, to);
+        const std::string copied = test::read_text(to);
+        return !copied.empty() && copied == test::read_text(from) ? 0 : 1;
+    };
+}
+int set_and_sync(const char* file) {
+    const double values[] = {1.5, 2.5};
+    const int status = WriteProfileDoubleArray("s", "New", values, 2, file);
+    return status != 0 ? status : SyncProfile(file);
+}
+int delete_and_sync_all(const char* file) {
+    if (GetSetProfileChar(1, "s", "New", "17.3", file) == nullptr) return 1;
+    DelProfileKey("s", "k", file);
+    return SyncProfile(nullptr) == -1 ? 0 : 1;
+}
+int read_keys(const char* file) {
+    int values[] = {0, 0};
+    const int status = GetParInt(file, "list", 2, values, 0, "t");
+    return judged(status, values[0] == 17 && values[1] == 29);
+}
+Run fall_back(Folder folder) {
+    auto pulse = std::make_shared<SARPulse_Obj>();
+    return [pulse, file = file_in(folder, "records.xml")] {  // which has no such section
+        const int status = pulse->readhdr(file);
+        (void)SyncProfile(nullptr);
+        return status == 1 ? 0 : 1;
+    };
+}
+
+template <typename Raster>
+std::shared_ptr<Raster> raster(Folder folder, const char* name) {
+    auto made = std::make_shared<Raster>();
+    made->setFilename(file_in(folder, name));
+    made->NrOfLinesPerImage = 7;
+    made->NrOfPixelsPerLine = 5;
+    made->CellType = FLOAT32;
+    return made;
+}
+constexpr char kOldRaster[] = "out.raw", kNewRaster[] = "new.raw";
+template <typename Raster, const char* kTo>
+Run copy_raster(Folder folder) {
+    return [from = raster<Raster>(folder, "in.raw"), file = file_in(folder, kTo)] { return from->copy(file); };
+}
+Run describe_raster(Folder folder) {
+    return [made = raster<DataFile>(folder, "out.raw")] { return made->write_hdr(); };
+}
+template <int kMode, int kBuffer>
+Run write_raster(Folder folder) {
+    auto made = raster<DataFile>(folder, "out.raw");
+    made->BufferSize = kBuffer;
+    return [=, bytes = test::raster_bytes(*made)] {
+        int status = made->open(kMode);
+        for (std::size_t done = 0; status == 0 && done < bytes.size(); done += 20)
+            status = made->write(bytes.data() + done, 20);
+        const int closed = made->close();
+        return status != 0 ? status : closed;
+    };
+}
+Run read_region(Folder folder) {
+    auto made = raster<DataFile>(folder, "in.raw");
+    return [made, file = file_in(folder, "in.raw")] {
+        std::array<float, 35> samples{};
+        int status = made->read_hdr(file);
+        if (status == 0)
+            status =
+                BufferIO{made.get(), 0, 5, 0, 7, FLOAT32}.readbuffer(reinterpret_cast<char*>(samples.data()), 5);
+        made->close();
+        return judged(status, samples[34] == static_cast<float>(test::part_value(6, 4, 0)));
+    };
+}
+
+Run write_chirp(Folder folder) {
+    auto pulse = std::make_shared<SARPulse_Obj>();
+    pulse->PulseLength = 1e-6;
+    pulse->Bandwidth = 17.3e6;
+    pulse->PulseSamplingRate = 2e7;
+    return [pulse, file = file_in(folder, "out.raw")] { return pulse->writeChirp(file); };
+}
+Run dump(Folder folder) {
+    return [file = file_in(folder, "out.raw")] {
+        const std::array<float, 6> values{17.3F};
+        return write_debug(file, values.data(), 0, 2, 3);
+    };
+}
+Run report(Folder folder) {
+    return [file = file_in(folder, "report"), shown = file_in(folder, "progress")] {
+        exit_report();
+        if (init_report(file, "title", 1) != 0) return 1;
+        quo_add_report("words", QUO_WARNING, 1, "function", "file");
+        quorelReport progress;
+        progress.setProgressName(shown);
+        const int status = progress.progress_update(17.3F, "words");
+        return exit_report() != 0 ? 1 : status;
+    };
+}
+
+constexpr auto kOldOrNew = test::Promise::kOldOrNew, kReports = test::Promise::kReports,
+               kUnchanged = test::Promise::kUnchanged, kTells = test::Promise::kTells,
+               kSurvives = test::Promise::kSurvives;
+
+}  // namespace
+
+const char* test::file_in(const std::string& folder, const char* name) {
+    static std::vector<std::unique_ptr<std::string>> names;
+    return names.emplace_back(std::make_unique<std::string>(folder + '/' + name))->c_str();
+}
+void test::PrintTo(const Job& job, std::ostream* stream) { *stream << job.name; }
+
+const std::vector<test::Job>& test::jobs() {
+    static const std::vector<Job> kJobs = {
+        {"DataFileObject", kReports, write_object<gsDataFile>},
+        {"Roi", kReports, write_object<gsRoi>},
+        {"Polynomials", kOldOrNew, write_object<gsPolySAR>},
+        {"SamplingConstants", kOldOrNew, write_object<gsSamplingConstants>},
+        {"Orbit", kOldOrNew, write_object<gsOrbit>},
+        {"SwathInfo", kOldOrNew, write_object<gsSwathInfo>},
+        {"AntennaPattern", kOldOrNew, write_object<gsAntennaPattern>},
+        {"GeoCoords", kOldOrNew, write_object<gsGeoCoords>},
+        {"BufferFileObject", kOldOrNew, write_object<gsBufferFile>},
+        {"Coregistration", kReports, write_coregistration},
+        {"Product", kReports, write_product<kProduct>, nullptr, true},
+        {"NewProduct", kReports, write_product<kNewProduct>},
+        {"Configuration", kOldOrNew, write_configuration},
+        {"CalibrationFactor", kOldOrNew, write_factor},
+        {"Document", kOldOrNew, with_document<quorelxml, add_values>},
+        {"Description", kOldOrNew, with_document<quorelxml, describe>},
+        {"StyleSheet", kOldOrNew, with_document<quorelxmlPi, add_instruction>},
+        {"Profile", kOldOrNew, with_profile<set_and_sync>, nullptr, true},
+        {"AllProfiles", kOldOrNew, with_profile<delete_and_sync_all>},
+        {"ProfileCopy", kOldOrNew, copy_profile},
+        {"SideFile", kOldOrNew, describe_raster},
+        {"DataFileCopy", kOldOrNew, copy_raster<DataFile, kOldRaster>, nullptr, true},
+        {"DataFileCopyToNew", kOldOrNew, copy_raster<DataFile, kNewRaster>},
+        {"BufferFileCopy", kOldOrNew, copy_raster<BufferFile, kOldRaster>},
+        {"Raster", kTells, write_raster<1, 0>},
+        {"BufferedRaster", kTells, write_raster<2, 48>},
+        {"Chirp", kTells, write_chirp},
+        {"Dump", kTells, dump},
+        {"Report", kSurvives, report},
+        {"ReadProduct", kUnchanged, read_product},
+        {"ReadOrbit", kUnchanged, use_orbit},
+        {"ReadDocument", kUnchanged, with_document<quorelxml, read_values>},
+        {"ReadProfile", kUnchanged, with_profile<read_keys>},
+        {"FallBack", kUnchanged, fall_back},
+        {"ReadRegion", kUnchanged, read_region},
+#ifdef QUO_TOOL
+        {"set", kOldOrNew, nullptr, "set @/product.hdr SamplingConstants/prf_hz 17.3"},
+        {"derive", kOldOrNew, nullptr, "derive @/scene.xml --what fr --replace"},
+        {"config", kOldOrNew, nullptr, "config new AzimuthConf -o @/product.hdr --replace"},
+        {"coregister", kOldOrNew, nullptr, "coregister @/scene.xml @/scene.xml -o @/product.hdr"},
+        {"convert", kOldOrNew, nullptr, "convert @/in.raw @/new.raw"},
+        {"convert_over", kOldOrNew, nullptr, "convert @/in.raw @/out.raw"},
+        {"convert_in_place", kOldOrNew, nullptr, "convert @/in.raw @/in.raw --order m"},
+        {"resample", kOldOrNew, nullptr, "resample @/in.raw @/out.raw --lines 9"},
+        {"quicklook", kOldOrNew, nullptr, "quicklook @/in.raw @/out.png", true},
+        {"spectrum", kOldOrNew, nullptr, "spectrum @/in.raw @/out.png"},
+        {"vrt", kOldOrNew, nullptr, "vrt @/in.raw"},
+        {"geolocate", kOldOrNew, nullptr,
+         "geolocate @/scene.xml --to ground --input @/points.csv --output @/out.csv"},
+        {"footprint", kUnchanged, nullptr, "footprint @/scene.xml"},
+        {"orbit", kUnchanged, nullptr, "orbit @/scene.xml"},
+        {"info", kUnchanged, nullptr, "info @/in.raw.hdr"},
+#endif
+    };
+    return kJobs;
+}
+
+void test::lay_out(const std::string& folder) {
+    const auto write = [&](const char* name, std::string_view text) { write_text(folder + '/' + name, text); };
+    const auto whole = product();
+    whole->GSwrite(file_in(folder, "whole.hdr"));
+    for (const GSObject object : all_objects()) whole->GSdisable(object);
+    for (const GSObject object : {gsSamplingConstants, gsRoi}) whole->GSenable(object);
+    whole->GSwrite(file_in(folder, "product.hdr"));
+    std::string other = read_text(folder + "/product.hdr");
+    std::replace(other.begin() + static_cast<std::ptrdiff_t>(other.find("<QuorelXmlDoc>")), other.end(), '8', '9');
+    write("product.hdr", other);
+    write("scene.xml", read_text(kScenes[0].path(".xml")));
+    write("a.par", "\n[s]\nk = 1\n\n[t]\nlist = {17 29}\n");
+    write("points.csv", "azimuth_time_s,range_time_s\n1167930360,0.0054\n");
+    for (const char* name : {"out.png", "out.csv", "in.raw.vrt", "report", "progress"}) write(name, "older");
+    std::filesystem::permissions(folder + "/a.par", std::filesystem::perms{0640});
+
+    GeneralSAR_configuration records;
+    records.azimuth.writepar(file_in(folder, "records.xml"), 1);
+    CoherenceConf{}.writepar(file_in(folder, "records.xml"), 1);
+
+    GeneralSAR stripmap;
+    using Info = DataSetInfo_Obj;
+    stripmap.dataSetInfo.SetType(Info::dsAzimuthFocused, Info::dsAsar, Info::dsStripmap, Info::dsSlantRange,
+                                 Info::dsVoltComplex, Info::dsRefSysUndefined);
+    stripmap.GSenable(gsDataSetInfo);
+    stripmap.GSenable(gsSamplingConstants);
+    std::snprintf(stripmap.dataSetInfo.Polarization, 512, "H/H");
+    std::snprintf(stripmap.dataSetInfo.Swath, 512, "IS1");
+    stripmap.GSwrite(file_in(folder, "stripmap.hdr"));
+
+    const auto in = raster<DataFile>(folder, "in.raw"), out = raster<DataFile>(folder, "out.raw");
+    out->CellType = INT32;
+    for (const auto& made : {in, out}) {
+        write_text(made->FileName, raster_bytes(*made));
+        made->write_hdr();
+    }
+}
