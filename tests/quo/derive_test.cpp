@@ -140,7 +140,7 @@ TEST(Derive, RefusesWithoutTouchingTheHeader) {
         const char* message;
     };
     const Case cases[] = {
-        {"<ROI>", "<Region>", {}, 1, "no state vectors"},  // not well-formed any more
+        {"<ROI>", "<Region>", {}, 1, "is no XML, line 173"},  // where the element ends by its old name
         {"<Samples>22694", "<Samples>0", {}, 1, "no region"},
         {"<LookDirection>1", "<Look>1", {}, 1, ""},
         {"", "", {"--region", "1", "0", "1", "1"}, 2, "lengths above 0"},
