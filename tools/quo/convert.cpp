@@ -71,7 +71,9 @@ public:
           wanted_{options, description, lines_, samples_},
           scaling_{options},
           in_{options.in, description},
-          out_{options.out, wanted_} {}
+          out_{options.out, wanted_} {
+        if (!scaling_.changes() && holds_every_value(wanted_, description)) out_.expect_no_losses();
+    }
 
     void run(bool waitbar) {
         copy_all(waitbar);

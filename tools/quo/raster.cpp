@@ -161,6 +161,13 @@ std::int64_t sample_offset(const RasterDescription& raster, std::int64_t line, s
            sample * size;
 }
 
+bool holds_every_value(const RasterDescription& to, const RasterDescription& from) {
+    const auto part = [](const RasterDescription& raster) {
+        return raster.element_sizeof() / (1 + raster.is_complex());
+    };
+    return beyond(to.CellType) && beyond(from.CellType) && part(from) <= part(to);
+}
+
 RasterReader::RasterReader(std::string name, const RasterDescription& description)
     : name_{std::move(name)}, file_{name_.c_str()} {
     file_.copyDescription(description);
@@ -233,7 +240,7 @@ void NewRaster::write_bytes(std::int64_t offset, const char* from, std::int64_t 
 template <typename T>
 void NewRaster::write(const Tile& tile, const T* from) {
     if constexpr (std::is_same_v<T, double> || std::is_same_v<T, dcomplex>) {
-        count_losses(from, tile.size(), file_.CellType, losses_);
+        if (counts_losses_) count_losses(from, tile.size(), file_.CellType, losses_);
         if (is_narrow(file_)) {
             const auto samples = static_cast<std::size_t>(tile.samples);
             narrow_.resize(samples * static_cast<std::size_t>(file_.element_sizeof()));

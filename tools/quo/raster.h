@@ -74,6 +74,9 @@ private:
     std::vector<signed char> narrow_;  // a line of 8-bit parts
 };
 
+/** Whether integers of one raster's type fit another's, so that none can be clipped or lost. */
+bool holds_every_value(const RasterDescription& to, const RasterDescription& from);
+
 /** How many samples of a raster of integers are not what they should be. */
 struct Losses {
     std::int64_t clipped = 0;  ///< held at the bounds of the type
@@ -99,6 +102,8 @@ public:
     void write_bytes(std::int64_t offset, const char* from, std::int64_t bytes);
     /** The raster is complete: it and its side file, in which other sections stay, take their names together. */
     void commit();
+    /** No value written from now on is beyond the type: looking for one would cost a third of a copy's time. */
+    void expect_no_losses() { counts_losses_ = false; }
     /** Says on standard error how many of the samples written could not be kept, if any. */
     void say_losses() const;
 
@@ -108,6 +113,7 @@ private:
     std::string name_;
     BufferFile file_;
     Losses losses_;
+    bool counts_losses_ = true;
     std::vector<signed char> narrow_;  // a line of 8-bit parts
 };
 
