@@ -55,7 +55,11 @@ Run read_product(Folder folder) {
         if ([&]() noexcept { return read->GSread(file); }() != 0) return 1;
         const auto there = test::present_in(*read);
         for (const GSObject object : there)
-            judged(0, test::differing_fields(*whole->GSget(object), *read->GSget(object)).empty());
+            if (const auto wrong = test::differing_fields(*whole->GSget(object), *read->GSget(object));
+                !wrong.empty()) {
+                std::fprintf(stderr, "object %d: %s differs", object, wrong.front().c_str());
+                std::abort();
+            }
         return there == test::present_in(*whole) ? 0 : 1;
     };
 }
@@ -131,13 +135,9 @@ template <int (*kUse)(const char* file)>
 Run with_profile(Folder folder) {
     return [file = file_in(folder, "a.par")] { return kUse(file); };
 }
-/** The copy always says 0: the files tell. */
 Run copy_profile(Folder folder) {
-    return [from = file_in(folder, "a.par"), to = file_in(folder, "out.csv")] {
-        (void)copyParameterFile(from, to);
-        const std::string copied = test::read_text(to);
-        return !copied.empty() && copied == test::read_text(from) ? 0 : 1;
-    };
+    return
+        [from = file_in(folder, "a.par"), to = file_in(folder, "out.csv")] { return copyParameterFile(from, to); };
 }
 int set_and_sync(const char* file) {
     const double values[] = {1.5, 2.5};
@@ -232,7 +232,7 @@ Run report(Folder folder) {
 
 constexpr auto kOldOrNew = test::Promise::kOldOrNew, kReports = test::Promise::kReports,
                kUnchanged = test::Promise::kUnchanged, kTells = test::Promise::kTells,
-               kSurvives = test::Promise::kSurvives;
+               kSurvives = test::Promise::kSurvives, kSilent = test::Promise::kSilent;
 
 }  // namespace
 
@@ -263,7 +263,7 @@ const std::vector<test::Job>& test::jobs() {
         {"StyleSheet", kOldOrNew, with_document<quorelxmlPi, add_instruction>},
         {"Profile", kOldOrNew, with_profile<set_and_sync>, nullptr, true},
         {"AllProfiles", kOldOrNew, with_profile<delete_and_sync_all>},
-        {"ProfileCopy", kOldOrNew, copy_profile},
+        {"ProfileCopy", kSilent, copy_profile},
         {"SideFile", kOldOrNew, describe_raster},
         {"DataFileCopy", kOldOrNew, copy_raster<DataFile, kOldRaster>, nullptr, true},
         {"DataFileCopyToNew", kOldOrNew, copy_raster<DataFile, kNewRaster>},

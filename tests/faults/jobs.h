@@ -12,6 +12,7 @@ namespace test {
 enum class Promise {
     kOldOrNew,   ///< every file together old or together new
     kReports,    ///< the same, but the status is always 0 and the report tells
+    kSilent,     ///< the same, but nothing tells
     kUnchanged,  ///< all old: the job reads, and gives 0 only with what is in the files
     kTells,      ///< writes where the file stands: 0 only where it is new
     kSurvives    ///< nothing more than not to crash

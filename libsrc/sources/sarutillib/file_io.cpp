@@ -356,7 +356,9 @@ bool AtomicFile::replace() noexcept {
 bool AtomicFile::replace_keeping_old() {
     const int folder = folder_.get();
     struct stat old {};
-    const bool is_old = ::fstatat(folder, name_.c_str(), &old, AT_SYMLINK_NOFOLLOW) == 0 && S_ISREG(old.st_mode);
+    const bool seen = ::fstatat(folder, name_.c_str(), &old, AT_SYMLINK_NOFOLLOW) == 0;
+    if (!seen && errno != ENOENT) return false;  // taken for absent, it would be removed by taking back
+    const bool is_old = seen && S_ISREG(old.st_mode);
     if (in_place_ || !is_old) return replace();
     target_ = Descriptor{::openat(folder, name_.c_str(), O_WRONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC)};
     if (target_) (void)lock(target_.get());
@@ -376,14 +378,27 @@ bool AtomicFile::replace_keeping_old() {
     return replaced;
 }
 
-/** Undoes a replacement that kept the old file; where there was none, the new one goes. */
+/** Undoes a replacement that kept the old file; where there was none, the new one goes. Where the names cannot be
+ * changed back, the old content is written over the new one; if that fails too, the old file stays beside it. */
 void AtomicFile::take_back() noexcept {
     const int error_before = errno;
-    if (keeps_old_ && ::renameat(folder_.get(), temporary_.c_str(), folder_.get(), name_.c_str()) == 0)
+    if (!keeps_old_) {
+        if (!in_place_) (void)::unlinkat(folder_.get(), name_.c_str(), 0);
+    } else if (::renameat(folder_.get(), temporary_.c_str(), folder_.get(), name_.c_str()) == 0 ||
+               !put_back_content()) {
         temporary_.clear();
-    else if (!keeps_old_ && !in_place_)
-        (void)::unlinkat(folder_.get(), name_.c_str(), 0);
+    }
     errno = error_before;
+}
+
+/** Writes the old content, kept under the temporary name, into the file that was put in its place. */
+bool AtomicFile::put_back_content() noexcept {
+    try {
+        const Descriptor old{::openat(folder_.get(), temporary_.c_str(), O_RDONLY | O_NOFOLLOW | O_CLOEXEC)};
+        return old && ::lseek(file_.get(), 0, SEEK_SET) == 0 && overwrite_content(old.get(), file_.get());
+    } catch (const std::exception&) {
+        return false;
+    }
 }
 
 bool AtomicFile::overwrite() noexcept {

@@ -88,6 +88,7 @@ private:
     bool replace() noexcept;
     bool replace_keeping_old();
     void take_back() noexcept;
+    bool put_back_content() noexcept;
     bool overwrite() noexcept;
     bool finish() noexcept;
     void discard() noexcept;
