@@ -97,14 +97,15 @@ public:
      * reading and writing. Any other mode opens nothing and returns 0. A file that is open is closed first. 0,
      * 7, 9. */
     int open(int mode);
-    /** Closes the file. In mode 1 and 2 pending bytes of the buffer are written first (5 leaves the file open);
-     * deliberate: in mode 3 they are not. The buffer is released and BufferSize becomes 0, deliberately: a closed
-     * file is unbuffered until the size is set again. 0 with no open file. */
+    /** Closes the file. In mode 1 and 2 pending bytes of the buffer are written first (5 leaves the file open); in
+     * mode 3 they are dropped, and only a seek() before writes them. The buffer is released and BufferSize becomes
+     * 0, so that a closed file is unbuffered until the size is set again. 0 with no open file. */
     int close();
     /** Moves to another place. Unbuffered: whence 0 from the start, 1 from the current position. Buffered and
      * writing (modes 1 to 3): the pending bytes are written, then the position grows by `offset` for either
      * whence. Buffered and reading: whence 0 stays within the buffer when the target lies after its start and
-     * before its end; whence 1 likewise, else the target is measured from the start of the buffer, deliberately.
+     * before its end; whence 1 likewise, else the target is measured from the start of the buffer, not from the
+     * place within it.
      * 0; 1 for another whence, a closed file or a place before the start; 5. */
     int seek(int64_t offset, int whence);
     /** Reads n bytes. 0; 1 in modes 1 and 2 or for a negative n; 4 where fewer are left, unbuffered with the

@@ -141,7 +141,7 @@ TYPED_TEST(Records, HoldTheirElementsInOrder) {
     EXPECT_STREQ(record.unit(1000), "");
 }
 
-// Defaults must lie within the bounds that they are documented with.
+// A default outside its own bounds would be refused as soon as it is written and checked.
 TYPED_TEST(Records, HaveDefaultsWithinTheirBounds) {
     const TypeParam record;
     for (int i = 0; i < record.elementCount(); ++i) {

@@ -83,7 +83,7 @@ const char* const kOlderContent =
     "<PolySAR><ndc>1</ndc><Stray/></PolySAR></Channel>\n"
     "<Channel Number=\"2\"><Pulse><PulseLength>803</PulseLength></Pulse></Channel>\n<Unknown/></QuorelXmlDoc>\n";
 
-/** Writes the present objects one after the other, as the container is documented to do. */
+/** Writes the present objects one after the other, the order in which the container does it. */
 void write_one_by_one(GeneralSAR& product, const std::string& name) {
     for (int i = GeneralSAR::kObjects; i-- > 0;) {
         const auto object = static_cast<GSObject>(i);

@@ -299,7 +299,7 @@ TEST_F(ReportFile, LogTakesNumberedLinesUntilTheReportIsClosed) {
     EXPECT_EQ(exit_report(), 0);
     EXPECT_EQ(quo_add_log("too late"), EOF);
     EXPECT_EQ(init_log(log_name.c_str(), "t", 1), 1) << "the log's level was not set back";
-    // With no report open there is no way to close a log: deliberate.
+    // With no report open there is no way to close a log: exit_report() looks at the report first.
     EXPECT_EQ(exit_report(), -1);
     EXPECT_EQ(quo_add_log("still open"), 0);
     EXPECT_EQ(test::read_text(log_name), "\n0) still open\n");

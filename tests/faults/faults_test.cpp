@@ -205,7 +205,7 @@ void Bench::be_tool() const {
     for (std::string& word : words) arguments.push_back(word.data());
     arguments.push_back(nullptr);
     setenv("LD_PRELOAD", QUO_FAULTS, 1);
-    setenv("QUO_FFT_ENGINE", "quo", 1);
+    setenv("QUO_FFT_ENGINE", "fftw", 1);
     setenv(test::kWatchVariable, std::to_string(shared_).c_str(), 1);
     execv(QUO_TOOL, arguments.data());
 #endif
@@ -215,7 +215,9 @@ void Bench::be_tool() const {
 Outcome Bench::wait(pid_t child) const {
     int ended = 0;
     if (waitpid(child, &ended, 0) != child) throw std::runtime_error("the child is lost");
-    Outcome outcome{.descriptors = watch_->returned ? watch_->descriptors : 0, .reached = watch_->reached};
+    Outcome outcome;
+    outcome.descriptors = watch_->returned ? watch_->descriptors : 0;
+    outcome.reached = watch_->reached;
     if (WIFEXITED(ended)) outcome.status = WEXITSTATUS(ended);
     if (WIFSIGNALED(ended)) outcome.signal = WTERMSIG(ended);
     if (job_.promise == Promise::kReports &&

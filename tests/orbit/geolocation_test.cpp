@@ -172,7 +172,7 @@ TEST_P(Journeys, LeadBack) {
     }
 }
 
-// The guess's steps as they are written down: the along-track frame of the whole orbit's mean velocity, the run in
+// The guess's steps, one by one: the along-track frame of the whole orbit's mean velocity, the run in
 // whose middle the point lies, and the same again in that run's frame.
 TEST_P(Headings, GuessesByItsSteps) {
     GeneralSAROrbit orbit;

@@ -37,7 +37,7 @@ void expect_empty(const GeneralSAROrbit& orbit) {
     EXPECT_EQ(orbit.nSV_n, 0);
 }
 
-/** The fields as documented, without the defaults. */
+/** The fields without their defaults. */
 constexpr test::FieldRow kRows[] = {
     test::real("pSV_m", 0, 0).keyed("pos"), test::real("vSV_mOs", 0, 0).keyed("vel"),
     test::real("t0SV_s").keyed("TimeFirst"), test::real("dtSV_s").keyed("TimeDelta"),

@@ -144,7 +144,7 @@ TEST_P(ConfigRefuses, InOneLine) {
 INSTANTIATE_TEST_SUITE_P(Cases, ConfigRefuses, testing::ValuesIn(kRefused),
                          [](const auto& row) { return row.param.name; });
 
-// The documented tables are those of the program.
+// The page shows the tables that the program prints.
 TEST(ConfigDoc, StandsInTheDocumentation) {
     const std::string page = read_text(QUO_TEST_DATA "/../../docs/configuration.md");
     const std::string begin = "<!-- printed by quo config doc -->\n", end = "<!-- end -->\n";

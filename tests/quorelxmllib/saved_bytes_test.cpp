@@ -23,7 +23,7 @@ void save(xmlDoc* tree, const std::string& file) {
     ASSERT_GT(xmlSaveFormatFileEnc(file.c_str(), tree, "UTF-8", 1), 0);
 }
 
-/** The documented way of writing, word for word: save, load without blank text nodes, save again. */
+/** The way of writing that saving in one go must equal: save, load without blank text nodes, save again. */
 std::string saved_twice(xmlDoc* tree, const std::string& file) {
     save(tree, file);
     const int before = xmlKeepBlanksDefault(0);

@@ -6,14 +6,6 @@
 #include "product.h"
 
 namespace tool {
-namespace {
-
-void append(std::vector<std::string>& names, const std::vector<std::string>& more) {
-    names.insert(names.end(), more.begin(), more.end());
-}
-
-}  // namespace
-
 bool same_file(const std::string& a, const std::string& b) {
     std::error_code error;
     return std::filesystem::is_regular_file(a, error) && std::filesystem::equivalent(a, b, error);

@@ -7,6 +7,7 @@
 #include "commands.h"
 #include "failure.h"
 #include "product.h"
+#include "scene.h"
 #include "shown.h"
 
 namespace tool {
@@ -77,6 +78,8 @@ int footprint(const std::string& header) {
     GeneralSAR product;
     read_product(header, product);
     const Ring ring = corners_of(product);
+    const std::string uneven = product.GSexists(gsOrbit) ? uneven_vectors(product.orbit) : "";
+    if (ring.empty() && !uneven.empty()) throw Failure(header + ": " + uneven);
     if (ring.empty())
         throw Failure(header + ": neither a corner grid nor orbit, region and look side to find the corners from");
     const nlohmann::ordered_json feature{

@@ -5,6 +5,7 @@
 
 #include "document.h"
 #include "failure.h"
+#include "scene.h"
 
 namespace tool {
 namespace {
@@ -89,7 +90,7 @@ std::vector<Corner> orbit_corners(GeneralSAR& product) {
     for (const GSObject needed : {gsOrbit, gsRoi, gsDataSetInfo}) {  // the last tells the look side
         if (!product.GSexists(needed)) return {};
     }
-    if (region.isNULL() != 0) return {};
+    if (region.isNULL() != 0 || !uneven_vectors(product.orbit).empty()) return {};
     // Of the last line and sample themselves: the region's lengths lead to the ones after them.
     const double first_s = region.SlowStartTime, near_s = region.FastStartTime;
     const double last_s = last_line_time(region);

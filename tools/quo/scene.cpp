@@ -67,15 +67,20 @@ void Scene::read_orbit() {
         throw Failure(name_ + ": " + why_no_orbit(name_.c_str(), status));
 }
 
-void Scene::require_even_vectors() const {
+std::string uneven_vectors(const GeneralSAROrbit& orbit) {
     std::vector<SVFinding> findings;
     std::string causes;
-    if (orbit_.SVCheck(findings) != 0) throw Failure(name_ + ": the state vectors cannot be checked");
+    if (orbit.SVCheck(findings) != 0) return "the state vectors cannot be checked";
     for (const SVFinding& finding : findings) {
         const bool uneven = finding.problem == SVFinding::kGap || finding.problem == SVFinding::kDuplicate ||
                             finding.problem == SVFinding::kOrder;
         if (uneven) causes += (causes.empty() ? "" : "; ") + std::string{finding.text};
     }
+    return causes;
+}
+
+void Scene::require_even_vectors() const {
+    const std::string causes = uneven_vectors(orbit_);
     if (!causes.empty()) throw Failure(name_ + ": " + causes);
 }
 

@@ -10,6 +10,10 @@
 
 namespace tool {
 
+/** What keeps state vectors from standing one spacing apart: gaps, duplicates, vectors out of order, in words.
+ * Every time behind such a place would be wrong. Empty where they do. */
+std::string uneven_vectors(const GeneralSAROrbit& orbit);
+
 /** What a product header says about the geometry: its orbit, with wavelength and look side already set where the
  * header knows them. Options of the command line take precedence. */
 class Scene {

@@ -31,8 +31,8 @@ private:
 
 constexpr int kBlock = 32;  // items of one scan: the format stays short however long the list is
 
-/** What the scanner stores for an item, and the item's own formats. The documented items would not do: the scanner
- * stores a float for "%g", whatever the precision. */
+/** What the scanner stores for an item, and the item's own formats. "%g" would not do for doubles: the scanner
+ * stores a float for it, whatever the precision. */
 template <typename T>
 struct Item;
 template <>

@@ -9,7 +9,7 @@ namespace quo {
 /** Longest scan format, characters, the final NUL included. */
 inline constexpr int kFormatRoom = 4096;
 
-/** The documented scan format of a list of `count` values: type 0 double, 1 float, 2 int, 3 string. Cut to the
+/** The scan format of a list of `count` values: type 0 double, 1 float, 2 int, 3 string. Cut to the
  * whole items that fit into kFormatRoom; empty for another type or a count below 1. */
 std::string list_format(int count, int type);
 
