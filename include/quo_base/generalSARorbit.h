@@ -24,7 +24,7 @@
  * report. One object serves one thread at a time. */
 
 namespace quo {
-class CallFrame;
+class CallerFrame;
 class OrbitModel;
 struct OrbitSample;
 }  // namespace quo
@@ -393,8 +393,9 @@ protected:
 
 private:
     bool modelReady() const noexcept;
-    int sampleAt(quo::CallFrame& frame, double t, double range, double doppler, quo::OrbitSample* sample) noexcept;
-    int locate(quo::CallFrame& frame, const double xyz[3], double doppler, bool precise, double* t,
+    int sampleAt(quo::CallerFrame frame, double t, double range, double doppler,
+                 quo::OrbitSample* sample) noexcept;
+    int locate(quo::CallerFrame frame, const double xyz[3], double doppler, bool precise, double* t,
                double* rangeTime) noexcept;
 
     std::unique_ptr<quo::OrbitModel> model_;  // tables for allocated vectors; filled by computeApproximateSV()

@@ -79,7 +79,7 @@ double distance_to_ellipsoid(const quo::Vec3& S, const quo::Vec3& u, const quo::
 
 }  // namespace
 
-int Obj::sampleAt(quo::CallFrame& frame, double t, double range, double doppler,
+int Obj::sampleAt(quo::CallerFrame frame, double t, double range, double doppler,
                   quo::OrbitSample* sample) noexcept {
     if (!modelReady()) return frame.fail(QUO_REFUSED, kNoModel);
     if (!std::isfinite(t)) return frame.fail(QUO_REFUSED, kBadArgument);
@@ -183,7 +183,7 @@ int Obj::earth2satLinear(const double xyz[3], double* t, double* rangeTime, doub
     return frame.success();
 }
 
-int Obj::locate(quo::CallFrame& frame, const double xyz[3], double doppler, bool precise, double* t,
+int Obj::locate(quo::CallerFrame frame, const double xyz[3], double doppler, bool precise, double* t,
                 double* rangeTime) noexcept {
     if (!t || !rangeTime) return frame.fail(QUO_REFUSED, kBadArgument);
     if (!modelReady()) {
