@@ -49,8 +49,8 @@ typedef struct FftPlan {
 QUO_BASE_API const char* fft_engine_name(void) QUO_NOEXCEPT;
 
 /** Why the engine failed on this thread: no engine can be loaded, memory is too short, or what the engine's
- * library answered. Statuses 4, 5 and 7 of the functions below leave it; making the next plan empties it. Nothing
- * of the kind goes into the report.
+ * library answered. Statuses 4, 5 and 7 of the functions below leave it, but for a chirp-z transform that finds no
+ * memory of its own (7); making the next plan empties it. Nothing of the kind goes into the report.
  * @return the text, empty where there is none; never null, and valid until this thread's next call of this header
  */
 QUO_BASE_API const char* fft_engine_error(void) QUO_NOEXCEPT;

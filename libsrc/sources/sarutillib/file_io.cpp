@@ -22,6 +22,7 @@ namespace {
 
 constexpr int kMostLinks = 40;         // as many as the kernel follows
 constexpr unsigned kSlots = 4;         // temporary names that are looked through for those of killed processes
+constexpr unsigned kOldSlot = kSlots;  // and one for an old file that may have to come back
 constexpr int kTemporaryTries = 32;    // of random names, where more processes than slots save one file at once
 constexpr mode_t kPermissions = 0777;  // set-user and set-group bits go, as they do whenever a file is written
 
@@ -108,8 +109,11 @@ bool lock(int file) noexcept {
 /** Takes away a temporary file whose process is gone: living ones hold a lock on theirs. Never follows a link and
  * never waits. */
 void sweep(int folder, const std::string& name) noexcept {
-    constexpr int kFlags = O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
-    const Descriptor left{::openat(folder, name.c_str(), kFlags)};
+    constexpr int kFlags = O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
+    Descriptor left;
+    // Some network file systems lock only what is open for writing; some files may only be read, or only written.
+    for (const int access : {O_RDWR, O_RDONLY, O_WRONLY})
+        if (!left) left = Descriptor{::openat(folder, name.c_str(), access | kFlags)};
     struct stat found {};
     if (left && ::fstat(left.get(), &found) == 0 && S_ISREG(found.st_mode) && lock(left.get()) &&
         is_entry(folder, name, left.get()))
@@ -272,6 +276,7 @@ bool AtomicFile::create_temporary(unsigned mode) {
         if (!made) made = create_in_slot(name, mode);
         if (!made && errno != EEXIST) return false;
     }
+    sweep(folder_.get(), slot_name(name_, kOldSlot));
     for (int tries = 0; !made && tries < kTemporaryTries; ++tries) {
         made = create_in_slot(random_name(), mode);
         if (!made && errno != EEXIST) return false;
@@ -358,36 +363,60 @@ bool AtomicFile::replace_keeping_old() {
     struct stat old {};
     const bool seen = ::fstatat(folder, name_.c_str(), &old, AT_SYMLINK_NOFOLLOW) == 0;
     if (!seen && errno != ENOENT) return false;  // taken for absent, it would be removed by taking back
-    const bool is_old = seen && S_ISREG(old.st_mode);
-    if (in_place_ || !is_old) return replace();
+    if (in_place_ || (seen && !S_ISREG(old.st_mode))) return replace();
+    if (!seen) {
+        const bool replaced = replace();
+        if (replaced && !in_place_) old_ = Old::kAbsent;
+        return replaced;
+    }
     target_ = Descriptor{::openat(folder, name_.c_str(), O_WRONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC)};
     if (target_) (void)lock(target_.get());
-    keeps_old_ = ::renameat2(folder, temporary_.c_str(), folder, name_.c_str(), RENAME_EXCHANGE) == 0;
-    if (keeps_old_) return true;
-    if (errno != EINVAL && errno != ENOSYS) return replace();
-    // A file system that cannot exchange names: a second name of the old file does as well.
-    const std::string second_name = random_name();
-    const bool named = ::linkat(folder, name_.c_str(), folder, second_name.c_str(), 0) == 0;
+    if (::renameat2(folder, temporary_.c_str(), folder, name_.c_str(), RENAME_EXCHANGE) != 0)
+        return replace_beside_second(old);
+    old_ = Old::kKept;
+    return true;
+}
+
+/** The same where the file system cannot exchange names: the old file gets a second one, or at least a copy. */
+bool AtomicFile::replace_beside_second(const struct stat& old) {
+    const int folder = folder_.get();
+    std::string second = slot_name(name_, kOldSlot);
+    sweep(folder, second);
+    if (::linkat(folder, name_.c_str(), folder, second.c_str(), 0) != 0 && !copy_old(second, old)) return false;
     const bool replaced = replace();
-    if (named && replaced && temporary_.empty()) {
-        temporary_ = second_name;
-        keeps_old_ = true;
-    } else if (named) {
-        (void)::unlinkat(folder, second_name.c_str(), 0);
+    if (replaced && !in_place_) {
+        temporary_ = std::move(second);
+        old_ = Old::kKept;
+    } else {
+        (void)::unlinkat(folder, second.c_str(), 0);
     }
     return replaced;
+}
+
+bool AtomicFile::copy_old(const std::string& second, const struct stat& old) {
+    const int folder = folder_.get();
+    const Descriptor from{::openat(folder, name_.c_str(), O_RDONLY | O_NOFOLLOW | O_CLOEXEC)};
+    if (!from) return false;
+    Descriptor to{::openat(folder, second.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, 0600)};
+    if (!to) return false;
+    (void)lock(to.get());
+    if (!adopt(to.get(), old) || !copy_content(from.get(), to.get())) {
+        const int error = errno;
+        (void)::unlinkat(folder, second.c_str(), 0);
+        return refuse(error);
+    }
+    target_ = std::move(to);
+    return true;
 }
 
 /** Undoes a replacement that kept the old file; where there was none, the new one goes. Where the names cannot be
  * changed back, the old content is written over the new one; if that fails too, the old file stays beside it. */
 void AtomicFile::take_back() noexcept {
     const int error_before = errno;
-    if (!keeps_old_) {
-        if (!in_place_) (void)::unlinkat(folder_.get(), name_.c_str(), 0);
-    } else if (::renameat(folder_.get(), temporary_.c_str(), folder_.get(), name_.c_str()) == 0 ||
-               !put_back_content()) {
-        temporary_.clear();
-    }
+    const int folder = folder_.get();
+    if (old_ == Old::kAbsent) (void)::unlinkat(folder, name_.c_str(), 0);
+    const bool back = old_ == Old::kKept && ::renameat(folder, temporary_.c_str(), folder, name_.c_str()) == 0;
+    if (back || (old_ == Old::kKept && !put_back_content())) temporary_.clear();
     errno = error_before;
 }
 

@@ -1,6 +1,8 @@
 #ifndef QUO_FILE_IO_H
 #define QUO_FILE_IO_H
 
+#include <sys/stat.h>
+
 #include <cstddef>
 #include <cstdint>
 #include <cstdio>
@@ -80,6 +82,10 @@ public:
 private:
     friend bool commit_pair(AtomicFile& first, AtomicFile& second) noexcept;
 
+    /** What became of the file that this one replaces: nothing is kept of it, temporary_ is it, or there was none.
+     */
+    enum class Old : std::uint8_t { kGone, kKept, kAbsent };
+
     bool open(std::string path);
     bool create_temporary(unsigned mode);
     bool create_in_slot(const std::string& name, unsigned mode);
@@ -87,6 +93,8 @@ private:
     bool flush_content() const noexcept;
     bool replace() noexcept;
     bool replace_keeping_old();
+    bool replace_beside_second(const struct stat& old);
+    bool copy_old(const std::string& second, const struct stat& old);
     void take_back() noexcept;
     bool put_back_content() noexcept;
     bool overwrite() noexcept;
@@ -97,12 +105,14 @@ private:
     Descriptor target_;             ///< what is written in place, or the old file while it may have to come back
     std::string name_, temporary_;  ///< names within the folder; temporary_ is empty when none exists
     bool in_place_ = false;
-    bool keeps_old_ = false;  ///< temporary_ is the old file
+    Old old_ = Old::kGone;
 };
 
 /** Makes two files that belong together, such as a raster and its description, new in one go: where the second
  * cannot be replaced, the first gets its old content back. Answers as commit() does. Where one of them is written
- * in place, so that its old content could not come back, that one is the last. */
+ * in place, so that its old content could not come back, that one is the last; where both are, the first stays new
+ * when the second fails. A process that is killed between the two replacements leaves the new first beside the old
+ * second. */
 [[nodiscard]] bool commit_pair(AtomicFile& first, AtomicFile& second) noexcept;
 
 /** The whole content of a regular file (or of a pipe or device up to `limit`), or nothing when it cannot be opened

@@ -9,6 +9,8 @@
 #include <limits>
 #include <string_view>
 
+#include "diagnosticslib/errno_kept.h"
+
 namespace quo {
 namespace {
 
@@ -53,7 +55,7 @@ std::size_t free_in_system() noexcept {
     return available == kUnlimited ? kUnlimited : available + kib(memory.number("SwapFree:", 0));
 }
 
-/** What the limit of a container or of a group of processes leaves. Its file cache counts against the limit but
+/** What the limit of the container leaves. Its file cache counts against the limit but
  * gives way, so that only what this process holds itself is taken off. */
 std::size_t free_in_group() noexcept {
     const std::size_t limit =
@@ -74,6 +76,7 @@ bool can_be_asked_for(std::size_t bytes) noexcept {
 }  // namespace
 
 bool has_room(const MemoryNeed& need) noexcept {
+    const ErrnoKept kept;
     if (!can_be_asked_for(need.addresses)) return false;
     return need.touched < kSmall || need.touched <= std::min(free_in_system(), free_in_group());
 }

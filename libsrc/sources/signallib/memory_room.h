@@ -12,9 +12,9 @@ struct MemoryNeed {
 };
 
 /** Whether the work can be begun: the addresses are really asked for, and given back; what comes into use is
- * compared with the memory that the system has free and with the limit of this process's group, because a system
- * that promises more than it has ends the process later. Needs of a few megabytes are only asked for. What errno
- * holds afterwards means nothing. */
+ * compared with the memory that the system has free and with the limit of the container that the process runs in,
+ * because a system that promises more than it has ends the process later. Needs of a few megabytes are only asked
+ * for. errno stays as it was. */
 [[nodiscard]] bool has_room(const MemoryNeed& need) noexcept;
 
 }  // namespace quo
