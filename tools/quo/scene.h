@@ -8,6 +8,8 @@
 
 #include "quo_base/generalSARorbit.h"
 
+class GeneralSAR;
+
 namespace tool {
 
 /** What a product header says about the geometry: its orbit, with wavelength and look side already set where the
@@ -46,10 +48,8 @@ public:
     std::vector<std::string> findings() const;
 
 private:
-    void read_orbit();
+    void take_orbit(GeneralSAR& product);
     void require_even_vectors() const;
-    void read_sampling();
-    void read_look_side();
 
     std::string name_;
     GeneralSAROrbit orbit_;
