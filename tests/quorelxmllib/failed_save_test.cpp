@@ -92,15 +92,19 @@ TEST_P(FailedSave, RefusesFoldersDevicesAndPlacesThatAreNotThere) {
     expect_failure(folder_.file(std::string(300, 'n')));
 }
 
+// A file that may be written in a folder that may not is written where it stands, with a warning.
 TEST_P(FailedSave, RespectsFilesAndFoldersThatMayNotBeWritten) {
     for (const auto& [file_mode, folder_mode] : {std::pair{0444, 0777}, {0666, 0555}}) {
         ASSERT_EQ(chmod(file_.c_str(), static_cast<mode_t>(file_mode)), 0);
         ASSERT_EQ(chmod(folder_.path().c_str(), static_cast<mode_t>(folder_mode)), 0);
+        const bool writable = file_mode == 0666;
+        test::Report report;
         const OrdinaryUser user;
         const test::CapturedStderr quiet;
-        EXPECT_EQ(GetParam().save(object_, file_.c_str()), 1);
+        EXPECT_EQ(GetParam().save(object_, file_.c_str()), writable ? 0 : 1);
+        EXPECT_EQ(report.messages("WARNING").size(), writable ? 1U : 0U);
+        EXPECT_EQ(read_text(file_) == old_, !writable);
     }
-    EXPECT_EQ(read_text(file_), old_);
     EXPECT_THAT(test::entries(folder_), ElementsAre("header.xml"));
     ASSERT_EQ(chmod(folder_.path().c_str(), 0755), 0);
 }
