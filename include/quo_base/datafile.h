@@ -123,9 +123,9 @@ public:
 
     /** Takes `file_name` as the raster's name and reads its side file: the XML form, else the profile form,
      * section "RasterInfo" with CellType and ByteOrder as names. An open file is closed. 0; 1 when a key is
-     * missing or the cell type unknown (CellType is then -1), with the values found taken over. */
+     * missing or the cell type unknown (CellType is then -1), with the values found taken over; 7. */
     int read_hdr(const char* file_name);
-    /** Writes the side file in XML form. 0; 1, also without a name, with the old one whole. */
+    /** Writes the side file in XML form. 0; 1, also without a name, or 7, with the old one whole. */
     int write_hdr();
     /** Takes over another file's name and description, buffer size included; opens nothing. This file is closed
      * first. 0 or the status of the close. */

@@ -50,8 +50,8 @@ public:
  * characters, and its side file is that name with ".hdr" appended: the header itself where it ends so. */
 class QUO_BASE_API GSDataFile_Obj : public GeneralSAR_Base {
 public:
-    /** Reads the side file of the header's raster. Deliberate: returns 0 whatever happens, so that a product
-     * always has this entry; a side file that could not be read whole leaves its entries in the report. */
+    /** Reads the side file of the header's raster. 0 whatever it holds, so that a product always has this entry;
+     * a side file that could not be read whole leaves its entries in the report. 7 where memory is short. */
     int readhdr(const char* file) override;
     /** Writes the side file of the header's raster; File keeps its own name. Deliberate: returns 0 even where
      * nothing could be written; the report tells. */

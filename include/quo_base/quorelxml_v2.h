@@ -285,11 +285,13 @@ public:
      * report entry, the old file still whole); 7. */
     int writeAuxiliaryFile() noexcept;
     /** Reads the object's section: the single values, then createBuffers(), then everything.
-     * @return 0; 1 when a mandatory element is missing or the buffers cannot be had; what was read stays. */
+     * @return 0; 1 when a mandatory element is missing or the buffers cannot be had; 4 when the file is there but
+     * could not be read; 7, also where only an optional element found no memory; what was read stays. */
     int readAuxiliaryFile() noexcept;
     /** Attach, write, detach. 0, or the failing status of the write. */
     int writeAuxiliaryFile(const char* file, int channel, const char* section) noexcept;
-    /** Attach, read, detach. True on success. A file that does not exist is not created. */
+    /** Attach, read, detach. True on success. A file that does not exist is not created. After a failure for want
+     * of memory, or of a file that could not be read, the object takes nothing from another form of the file. */
     bool readAuxiliaryFile(const char* file, int channel, const char* section) noexcept;
     /** Always true. */
     bool checkAuxiliaryFile() const noexcept;
@@ -347,16 +349,19 @@ private:
     bool textsCanBeStored() const;
     int writeElement(const parElement& element);
     int writeSection();
-    bool readElement(const parElement& element, int count);
-    bool readScalars(bool& lengths_changed);
+    int readElement(const parElement& element, int count);
+    int readScalars(bool& lengths_changed);
     bool hasArrays() const noexcept;
-    bool readEverything();
+    int readEverything();
+    int readSection();
 
     std::int32_t element_count_ = 0;
     std::int32_t cursor_ = 0;
     parElement* elements_ = nullptr;  // owned while list_owned_ is set
     bool allocated_ = false;
     bool list_owned_ = true;
+    bool table_refused_ = false;  // no memory for the table: the object can neither be read nor written
+    std::int32_t unread_ = 0;     // 4 or 7 when the last read of a file failed for that, else 0
     quorelxml document_;
     std::int32_t channel_ = 0;
     std::string section_;

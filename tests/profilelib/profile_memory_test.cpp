@@ -1,9 +1,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <unistd.h>
 
 #include <string>
-#include <string_view>
 
 #include "quo_base/profile.h"
 #include "support/diagnostics.h"
@@ -11,58 +9,10 @@
 
 namespace {
 
-const std::string long_name(99, 'n');
-
-bool reads(const char* file, std::string_view value) {
-    const char* const found = GetSetProfileChar(0, "s", "k", nullptr, file);
-    return found && found == value;
-}
 int write_long_list(const char* file) {
     static const int values[5000] = {};
     return WriteMyProfileIntArray("s", "k", values, 5000, file);
 }
-
-/** A call, and whether it did what it is for. */
-struct Call {
-    const char* name;
-    bool (*run)(const char* file);
-};
-constexpr Call kCalls[] = {
-    {"Read", [](const char* file) { return reads(file, "2"); }},
-    {"Change",
-     [](const char* file) {
-         return GetSetProfileChar(1, "s", "k", long_name.c_str(), file) && reads(file, long_name);
-     }},
-    {"AddSection",
-     [](const char* file) {
-         return GetSetProfileChar(1, long_name.c_str(), "k", "v", file) == std::string_view{"v"};
-     }},
-    {"WriteBack", [](const char* file) { return reads(file, "2") && SyncProfile(file) == 0; }},
-    {"WriteLongList", [](const char* file) { return write_long_list(file) == 0; }},
-};
-class ProfileMemory : public testing::TestWithParam<Call> {};
-
-// The n-th allocation fails, for every n until the call gets through: each time the process ends with the message.
-TEST_P(ProfileMemory, EveryFailedAllocationEndsTheProcess) {
-    const test::TemporaryFolder folder;
-    const std::string path = folder.file("a.par"), old = "[s]\n" + std::string(99, 'k') + " = 1\nk = 2\n";
-    test::write_text(path, old);
-    bool through = false;
-    int room = 0;
-    for (; !through && room < 200 && !HasFailure(); ++room) {
-        EXPECT_EXIT((test::fail_news(room), _exit(GetParam().run(path.c_str()) ? 0 : 2)),
-                    [&](int status) {
-                        through = testing::ExitedWithCode(0)(status);
-                        return through || testing::ExitedWithCode(1)(status);
-                    },
-                    "^(Memory (re-)?allocation failure\n)?$");
-        EXPECT_TRUE(through || test::read_text(path) == old);
-    }
-    EXPECT_TRUE(through);
-    EXPECT_GT(room, 3) << "no allocation was seen to fail";
-}
-INSTANTIATE_TEST_SUITE_P(Calls, ProfileMemory, testing::ValuesIn(kCalls),
-                         [](const auto& row) { return std::string{row.param.name}; });
 
 TEST(ProfileMemory, TellsGrowthFromAFirstAllocation) {
     constexpr const char* kMessages[] = {"Memory allocation failure\n", "Memory re-allocation failure\n"};

@@ -143,62 +143,6 @@ TEST_F(HostileFiles, HeadersAndRastersAnswerToBothNames) {
     }
 }
 
-// Runs the tool while no file may grow beyond `blocks` units of the shell; its messages, then "exit N".
-std::string with_room(int blocks, const std::vector<std::string>& arguments) {
-    std::vector<std::string> all{"-c",
-                                 "trap '' XFSZ; { (ulimit -f " + std::to_string(blocks) +
-                                     R"(; exec "$0" "$@"); echo "exit $?"; } 2>&1 | cat)",
-                                 QUO_TOOL};
-    all.insert(all.end(), arguments.begin(), arguments.end());
-    return test::Child{"/bin/sh", all}.wait().out;
-}
-
-TEST_F(HostileFiles, FullDisksLeaveOlderFilesWhole) {
-    const std::string in = make("in.raw", 40, 30, INT16, 0), older = "older";
-    const std::string header = file("scene.xml"), scene = test::scene_file(test::scenes().front());
-    test::write_text(header, test::read_text(scene));
-    for (const char* name : {"out.raw", "out.png", "out.csv", "in.raw.vrt"}) test::write_text(file(name), older);
-    test::write_text(file("points.csv"), "azimuth_time_s,range_time_s\n1167930360,0.0054\n");
-    const std::vector<std::vector<std::string>> jobs{
-        {"convert", in, file("out.raw")},
-        {"resample", in, file("out.raw"), "--lines", "50"},
-        {"quicklook", in, file("out.png")},
-        {"spectrum", in, file("out.png")},
-        {"vrt", in},
-        {"set", header, "SamplingConstants/prf_hz", "17"},
-        {"derive", header},
-        {"config", "new", "AzimuthConf", "-o", header},
-        {"coregister", scene, scene, "-o", header},
-        {"geolocate", scene, "--to", "ground", "--input", file("points.csv"), "--output", file("out.csv")},
-    };
-    const auto before = files();
-    for (const auto& job : jobs) {
-        SCOPED_TRACE(job.front());
-        const std::string said = with_room(0, job);
-        EXPECT_THAT(said, testing::MatchesRegex("quo: [^\n]*File too large[^\n]*\nexit 1\n"));
-        EXPECT_EQ(files(), before);
-    }
-    for (const char* name : {"out.raw", "out.png", "out.csv", "in.raw.vrt"})
-        EXPECT_EQ(test::read_text(file(name)), older);
-    EXPECT_EQ(test::read_text(header), test::read_text(scene));
-}
-
-// However far the disk lets it come.
-TEST_F(HostileFiles, ConversionsThatRunOutOfRoomLeaveTheOlderPairWhole) {
-    const std::string in = make("in.raw", 60, 50, INT16, 0, 9), out = make("out.raw", 7, 5, INT32, 1);
-    const std::string raster = test::read_text(out), side_file = test::read_text(out + ".hdr");
-    const auto before = files();
-    std::string said;
-    for (int blocks = 0; said != "exit 0\n"; ++blocks) {
-        ASSERT_LT(blocks, 20) << said;
-        EXPECT_EQ(test::read_text(out), raster);
-        EXPECT_EQ(test::read_text(out + ".hdr"), side_file);
-        said = with_room(blocks, {"convert", in, out});
-        EXPECT_EQ(files(), before);
-    }
-    EXPECT_TRUE(test::read_text(out) == test::read_text(in));
-}
-
 TEST_F(HostileFiles, AFullStandardOutputIsAFailure) {
     const std::string scene = test::scene_file(test::scenes().front());
     for (const std::string job : {"info", "validate", "footprint", "orbit", "get"}) {

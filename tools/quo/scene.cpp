@@ -11,8 +11,7 @@
 #include "document.h"
 #include "failure.h"
 #include "number.h"
-#include "quo_base/acquisition.h"
-#include "quo_base/dataset_info.h"
+#include "quo_base/generalSAR.h"
 
 namespace tool {
 namespace {
@@ -56,15 +55,22 @@ std::string why_no_orbit(const char* header, int status) {
 
 Scene::Scene(const std::string& header, Vectors vectors) : name_{header} {
     require_readable(name_);
-    read_orbit();
+    // In one go: of a file that can be read at one time and not at another, a wavelength that was not found would
+    // count as one that is not there.
+    GeneralSAR product;
+    if (product.GSread(name_.c_str()) != 0) throw Failure(name_ + ": cannot be read");
+    take_orbit(product);
     if (vectors == Vectors::kEvenOnly) require_even_vectors();
-    read_sampling();
-    read_look_side();
+    const double wavelength_m = product.samplingConstants.lambda_m;
+    if (product.GSexists(gsSamplingConstants) && wavelength_m > 0.0) use_wavelength(wavelength_m);
+    if (product.GSexists(gsDataSetInfo)) use_look_sign(product.dataSetInfo.LookDirection);
 }
 
-void Scene::read_orbit() {
-    if (const int status = orbit_.readhdr(name_.c_str()))
-        throw Failure(name_ + ": " + why_no_orbit(name_.c_str(), status));
+void Scene::take_orbit(GeneralSAR& product) {
+    // Read by itself it tells why there is none.
+    const int status = product.GSexists(gsOrbit) ? product.orbit.clone(&orbit_) : orbit_.readhdr(name_.c_str());
+    if (status != 0) throw Failure(name_ + ": " + why_no_orbit(name_.c_str(), status));
+    if (!product.GSexists(gsOrbit)) throw Failure(name_ + ": cannot be read");
 }
 
 std::string uneven_vectors(const GeneralSAROrbit& orbit) {
@@ -82,16 +88,6 @@ std::string uneven_vectors(const GeneralSAROrbit& orbit) {
 void Scene::require_even_vectors() const {
     const std::string causes = uneven_vectors(orbit_);
     if (!causes.empty()) throw Failure(name_ + ": " + causes);
-}
-
-void Scene::read_sampling() {
-    SamplingConstants_Obj sampling;
-    if (sampling.readhdr(name_.c_str()) == 0 && sampling.lambda_m > 0.0) use_wavelength(sampling.lambda_m);
-}
-
-void Scene::read_look_side() {
-    DataSetInfo_Obj data_set;
-    if (data_set.readhdr(name_.c_str()) == 0) use_look_sign(data_set.LookDirection);
 }
 
 void Scene::use_wavelength(double wavelength_m) {

@@ -8,6 +8,8 @@
 
 #include "quo_base/generalSARorbit.h"
 
+class GeneralSAR;
+
 namespace tool {
 
 /** What keeps state vectors from standing one spacing apart: gaps, duplicates, vectors out of order, in words.
@@ -50,10 +52,8 @@ public:
     std::vector<std::string> findings() const;
 
 private:
-    void read_orbit();
+    void take_orbit(GeneralSAR& product);
     void require_even_vectors() const;
-    void read_sampling();
-    void read_look_side();
 
     std::string name_;
     GeneralSAROrbit orbit_;

@@ -270,6 +270,7 @@ int geopoint::writehdr(const char* file, const char* name) {
 int geopoint::readhdr(const char* file, const char* name) {
     // Deliberate: what Point holds becomes the named members even where neither form of the file has the point.
     if (!readAuxiliaryFile(file, 1, point::section_of(name).c_str())) {
+        if (const int unread = quo::RegistryAccess::unread(*this)) return unread;
         const quo::ProfileLook look{file};
         GetProfileDoubleArray(point::kProfileSection, name, Point, static_cast<int>(std::size(Point)), file);
     }

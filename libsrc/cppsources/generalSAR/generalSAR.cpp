@@ -36,8 +36,16 @@ int GeneralSAR::GSread(const char* file) {
         const quo::JoinedSession session{file};
         const quo::ProfileLook look{file};
         GSdestroy();
-        for (int i = 0; i < kObjects; ++i)
-            present_[i] = quo::guarded(frame, [&] { return objects_[i]->readhdr(file); }) == QUO_OK;
+        for (int i = 0; i < kObjects; ++i) {
+            const int failures = session.failures();
+            const int status = quo::guarded(frame, [&] { return objects_[i]->readhdr(file); });
+            if (status == QUO_NO_MEMORY) quo::HeaderSession::fail_all(status);
+            present_[i] = status == QUO_OK;
+            if (session.failures() == failures) continue;
+            // Some objects answer 0 whatever they found, and some without a word.
+            present_[i] = false;
+            (void)frame.fail(QUO_READ_FAILED, "An object of the product cannot be read");
+        }
         linkObjects();
         return frame.success();
     });
@@ -54,12 +62,15 @@ int GeneralSAR::GSwrite(const char* file) {
     quo::CallFrame frame{"GeneralSAR::GSwrite", kSource};
     const int status = quo::guarded(frame, [&] {
         quo::JoinedSession header{file}, side_file{side_file_of(file).c_str()};
-        for (int i = kObjects; i-- > 0;)
-            if (present_[i] && objects_[i]->writehdr(file) == QUO_NO_MEMORY)
-                quo::HeaderSession::fail_all(QUO_NO_MEMORY);
+        for (int i = kObjects; i-- > 0;) {
+            if (!present_[i] || objects_[i]->writehdr(file) != QUO_NO_MEMORY) continue;
+            quo::HeaderSession::fail_all(QUO_NO_MEMORY);
+            (void)frame.fail(QUO_NO_MEMORY, "Memory allocation failure");  // the object itself may report nothing
+        }
         const int saved = header.commit();
         return saved ? saved : side_file.commit();
     });
+    if (status != QUO_OK) quo::HeaderSession::fail_all(status);  // a session around this one would save less
     return status ? QUO_OK : frame.success();  // callers rely on 0: the outcome stands in the report alone
 }
 

@@ -48,6 +48,9 @@ struct RegistryAccess {
     static void refresh(GeneralSAR_BaseXML& object);
     /** Whether an array of `count` values may be allocated for what the object is being read from. */
     static bool can_hold(const GeneralSAR_BaseXML& object, std::int64_t count);
+    /** 4 or 7 when the object's last read of a header file failed because the file could not be read or for want
+     * of memory, else 0: then its section is not missing, and no other form of the file may take its place. */
+    static int unread(const GeneralSAR_BaseXML& object);
     /** Names the parameter file that is being read as the source of lengths; null ends it. */
     static void set_source(GeneralSAR_BaseXML& object, const char* file);
 };
@@ -369,23 +372,25 @@ public:
     /** Reads the fields from the parameter file: single values and arrays of fixed size, then createBuffers(),
      * then the arrays that it made. Every key is read, even after a failure. The file does not stay among the
      * parameter files in memory.
-     * @return 0; 1, with the pending errors cleared, when a mandatory key failed. */
+     * @return 0; 1, with the pending errors cleared, when a mandatory key failed, and with nothing read when the
+     * other form of the file was not found missing but could not be read. */
     int read_profile(Owner& object, const char* file) const { return read_profile(object, file, section_); }
     int read_profile(Owner& object, const char* file, const char* section) const {
-        const ProfileLook look{file};
-        bool complete = read_profile_part(object, file, section, false);
-        if (has_arrays()) {
-            RegistryAccess::set_source(object, file);
-            complete =
-                object.createBuffers() == QUO_OK && read_profile_part(object, file, section, true) && complete;
-            RegistryAccess::set_source(object, nullptr);
-        }
-        if (complete) return QUO_OK;
+        if (RegistryAccess::unread(object) == QUO_OK && read_profile_fully(object, file, section)) return QUO_OK;
         freeall_ckerr();
         return QUO_REFUSED;
     }
 
 private:
+    bool read_profile_fully(Owner& object, const char* file, const char* section) const {
+        const ProfileLook look{file};
+        const bool complete = read_profile_part(object, file, section, false);
+        if (!has_arrays()) return complete;
+        RegistryAccess::set_source(object, file);
+        const bool arrays = object.createBuffers() == QUO_OK && read_profile_part(object, file, section, true);
+        RegistryAccess::set_source(object, nullptr);
+        return arrays && complete;
+    }
     [[nodiscard]] int release(Owner& object, int status) const {
         destroy_buffers(object);
         return status;

@@ -76,6 +76,8 @@ public:
     /** The same into a file that the caller makes new, alone or with another that belongs to it. */
     [[nodiscard]] bool save(AtomicFile& file);
 
+    /** Whether the document only stands in for a file that could not be read: what it lacks may be there. */
+    [[nodiscard]] bool stands_in() const noexcept { return stands_in_; }
     /** Whether both `NumberOfChannels` and `Description` stand below the root `QuorelXmlDoc`. */
     [[nodiscard]] bool is_header() const noexcept { return find("NumberOfChannels") && find("Description"); }
     /** The element `NumberOfChannels` or `Description` below the root, or null. */

@@ -58,7 +58,10 @@ HeaderSession* HeaderSession::find(const char* file) {
 }
 
 void HeaderSession::fail_all(int status) noexcept {
-    for (HeaderSession* session = innermost; session; session = session->outer_) session->note_write(status);
+    for (HeaderSession* session = innermost; session; session = session->outer_) {
+        session->note_write(status);
+        ++session->failures_;
+    }
 }
 
 HeaderSession* HeaderSession::owner(const std::shared_ptr<HeaderDocument>& document) noexcept {

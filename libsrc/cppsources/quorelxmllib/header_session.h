@@ -44,8 +44,11 @@ public:
     static HeaderSession* owner(const std::shared_ptr<HeaderDocument>& document) noexcept;
 
     /** Lets no open session of this thread commit any more, which then gives `status`: for what failed before it
-     * could be told to whose file it belongs. */
+     * could be told to whose file it belongs, and for an object that could not be read, whose content is not what
+     * the file has. */
     static void fail_all(int status) noexcept;
+    /** How often that was said. */
+    [[nodiscard]] int failures() const noexcept { return failures_; }
 
     /** The file's document, parsed at the first call; null, and 7 in `status`, when it does not fit into memory. A
      * missing or foreign file gives a fresh document, and one that cannot be read a document that only stands in.
@@ -58,7 +61,7 @@ private:
     std::string file_;
     HeaderSession* outer_;
     std::shared_ptr<HeaderDocument> document_;
-    int failed_ = QUO_OK;
+    int failed_ = QUO_OK, failures_ = 0;
     bool changed_ = false;
 };
 
@@ -66,13 +69,16 @@ private:
  * which are read and written by themselves or with a whole product. */
 class JoinedSession {
 public:
-    explicit JoinedSession(const char* file) {
-        if (!HeaderSession::find(file)) own_.emplace(file);
+    explicit JoinedSession(const char* file) : session_{HeaderSession::find(file)} {
+        if (!session_) session_ = &own_.emplace(file);
     }
     /** Saves what was written, unless that is left to the session that was open already. */
     [[nodiscard]] int commit() { return own_ ? own_->commit() : QUO_OK; }
+    /** See HeaderSession::failures. */
+    [[nodiscard]] int failures() const noexcept { return session_->failures(); }
 
 private:
+    HeaderSession* session_;
     std::optional<HeaderSession> own_;
 };
 

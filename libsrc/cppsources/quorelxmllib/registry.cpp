@@ -21,11 +21,17 @@ using quo::HeaderSession;
 namespace {
 
 constexpr const char* kSource = "quorelxml_v2";
+constexpr const char* kNoMemory = "Memory allocation failure";
 constexpr std::size_t kNameRoom = 512;
 
 std::span<char* const> texts_of(const parElement& element, char* const& single) {
     if (!element.text_array) return {&single, 1};
     return {static_cast<char* const*>(element.pointer), static_cast<std::size_t>(element.count)};
+}
+
+/** Whether an element's status fails the whole read: one that found no memory is not known to be missing. */
+bool fails_read(const parElement& element, int status) {
+    return status == QUO_NO_MEMORY || (status != QUO_OK && element.mandatory);
 }
 
 }  // namespace
@@ -87,7 +93,8 @@ int GeneralSAR_BaseXML::createElementsVector(int count) {
     (void)destroyElementsVector();  // a class between this one and the object's own may have made a table already
     if (count < 0) return frame.fail(QUO_REFUSED, "Negative number of elements");
     elements_ = new (std::nothrow) parElement[static_cast<std::size_t>(count)];
-    if (!elements_) return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
+    table_refused_ = !elements_;
+    if (!elements_) return frame.fail(QUO_NO_MEMORY, kNoMemory);
     element_count_ = count;
     allocated_ = true;
     refreshParameters();
@@ -260,6 +267,7 @@ int GeneralSAR_BaseXML::writeSection() {
 
 int GeneralSAR_BaseXML::writeAuxiliaryFile() noexcept {
     CallFrame frame{"GeneralSAR_BaseXML::writeAuxiliaryFile", kSource};
+    if (table_refused_) return frame.fail(QUO_NO_MEMORY, kNoMemory);
     return guarded(frame, [&] {
         HeaderSession* session = HeaderSession::owner(document_.document_);
         // A document that other objects share keeps the old section when this object cannot be written.
@@ -286,41 +294,38 @@ int GeneralSAR_BaseXML::writeAuxiliaryFile(const char* file, int channel, const 
 
 // --- reading ----------------------------------------------------------------------------------------------------
 
-bool GeneralSAR_BaseXML::readElement(const parElement& element, int count) {
+int GeneralSAR_BaseXML::readElement(const parElement& element, int count) {
     const std::string field = section_ + '/' + element.name;
     switch (element.type) {
         case parElement::typeDouble:
-            return document_.readDouble(channel_, field.c_str(), static_cast<double*>(element.pointer), count) ==
-                   QUO_OK;
+            return document_.readDouble(channel_, field.c_str(), static_cast<double*>(element.pointer), count);
         case parElement::typeFloat:
-            return document_.readFloat(channel_, field.c_str(), static_cast<float*>(element.pointer), count) ==
-                   QUO_OK;
+            return document_.readFloat(channel_, field.c_str(), static_cast<float*>(element.pointer), count);
         case parElement::typeInt:
-            return document_.readInt(channel_, field.c_str(), static_cast<std::int32_t*>(element.pointer),
-                                     count) == QUO_OK;
+            return document_.readInt(channel_, field.c_str(), static_cast<std::int32_t*>(element.pointer), count);
         case parElement::typeString: {
             char* const single = static_cast<char*>(element.pointer);
             return document_.readString(channel_, field.c_str(), texts_of(element, single).data(), count,
-                                        element.room) == QUO_OK;
+                                        element.room);
         }
         case parElement::typeNone:
             break;
     }
-    return false;
+    return QUO_REFUSED;
 }
 
-bool GeneralSAR_BaseXML::readScalars(bool& lengths_changed) {
+int GeneralSAR_BaseXML::readScalars(bool& lengths_changed) {
     for (int i = 0; i < element_count_; ++i) {
         const parElement& element = elements_[i];
         if (!element.scalar || element.type == parElement::typeString) continue;
         const auto* length =
             element.type == parElement::typeInt ? static_cast<std::int32_t*>(element.pointer) : nullptr;
         const std::int32_t before = length ? *length : 0;
-        const bool read = readElement(element, 1);
+        const int status = readElement(element, 1);
         lengths_changed = lengths_changed || (length && *length != before);
-        if (!read && element.mandatory) return false;
+        if (fails_read(element, status)) return status;
     }
-    return true;
+    return QUO_OK;
 }
 
 bool GeneralSAR_BaseXML::hasArrays() const noexcept {
@@ -328,25 +333,36 @@ bool GeneralSAR_BaseXML::hasArrays() const noexcept {
                        [](const parElement& element) { return !element.scalar && element.count > 0; });
 }
 
-bool GeneralSAR_BaseXML::readEverything() {
+int GeneralSAR_BaseXML::readEverything() {
     for (int i = 0; i < element_count_; ++i) {
         const parElement& element = elements_[i];
-        if (element.count > 0 && !readElement(element, element.count) && element.mandatory) return false;
+        if (element.count < 1) continue;
+        const int status = readElement(element, element.count);
+        if (fails_read(element, status)) return status;
     }
-    return true;
+    return QUO_OK;
+}
+
+int GeneralSAR_BaseXML::readSection() {
+    bool lengths_changed = false;
+    const int scalars = readScalars(lengths_changed);
+    // Also after a failure: a length that was read must never stand beside an array of another length.
+    const bool create = scalars == QUO_OK || (lengths_changed && hasArrays());
+    const int created = create ? createBuffers() : QUO_REFUSED;
+    if (create && created != QUO_OK) (void)destroyBuffers();
+    if (scalars != QUO_OK) return scalars;
+    if (created != QUO_OK) return created == QUO_NO_MEMORY ? created : QUO_REFUSED;
+    return allocated_ ? readEverything() : QUO_REFUSED;
 }
 
 int GeneralSAR_BaseXML::readAuxiliaryFile() noexcept {
     CallFrame frame{"GeneralSAR_BaseXML::readAuxiliaryFile", kSource};
+    if (table_refused_) return frame.fail(QUO_NO_MEMORY, kNoMemory);
+    // A document that stands in lacks every section; the file, which could not be read, may have them all.
+    if (document_.document_ && document_.document_->stands_in()) return frame.silent(QUO_READ_FAILED);
     return guarded(frame, [&] {
-        bool lengths_changed = false;
-        const bool scalars = readScalars(lengths_changed);
-        // Also after a failure: a length that was read must never stand beside an array of another length.
-        const bool create = scalars || (lengths_changed && hasArrays());
-        const bool created = create && createBuffers() == QUO_OK;
-        if (create && !created) (void)destroyBuffers();
-        const bool read = scalars && created && allocated_ && readEverything();
-        return read ? frame.success() : frame.silent(QUO_REFUSED);
+        const int status = readSection();
+        return status ? frame.silent(status) : frame.success();
     });
 }
 
@@ -355,6 +371,9 @@ bool GeneralSAR_BaseXML::readAuxiliaryFile(const char* file, int channel, const 
     int status = setAuxiliaryFile(file, channel, section);
     if (status == QUO_OK) status = readAuxiliaryFile();
     (void)unsetAuxiliaryFile();
+    unread_ = status == QUO_READ_FAILED || status == QUO_NO_MEMORY ? status : QUO_OK;
+    // What a session writes after this would not be what its file has.
+    if (unread_ != QUO_OK) HeaderSession::fail_all(unread_);
     return (status ? frame.silent(status) : frame.success()) == QUO_OK;
 }
 
@@ -396,6 +415,8 @@ void RegistryAccess::refresh(GeneralSAR_BaseXML& object) { object.refreshParamet
 bool RegistryAccess::can_hold(const GeneralSAR_BaseXML& object, std::int64_t count) {
     return object.sourceCanHold(count);
 }
+
+int RegistryAccess::unread(const GeneralSAR_BaseXML& object) { return object.unread_; }
 
 void RegistryAccess::set_source(GeneralSAR_BaseXML& object, const char* file) {
     object.source_length_ = file ? file_length(file).value_or(0) : -1;

@@ -17,6 +17,8 @@
 #include "diagnosticslib/saved_in_place.h"
 #include "profilelib/profile_look.h"
 #include "quo_base/profile.h"
+#include "quorelxmllib/field_table.h"
+#include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_session.h"
 #include "sarutillib/bounded_text.h"
 #include "sarutillib/checked_size.h"
@@ -71,6 +73,23 @@ private:
     char text_[512] = "";
     bool complete_ = true;
 };
+
+/** Takes the description from the profile form of a side file. False when a key is missing or the cell type
+ * unknown. */
+bool read_profile(RasterDescription& raster, const char* side_file) {
+    const quo::ProfileLook look{side_file};
+    ProfileForm form{side_file};
+    auto offset = static_cast<std::int32_t>(raster.HeaderOffset);
+    form.read("HeaderOffset", offset);
+    raster.HeaderOffset = offset;
+    form.read("RowPrefix", raster.RowPrefix);
+    form.read("NrOfPixelsPerLine", raster.NrOfPixelsPerLine);
+    form.read("NrOfLinesPerImage", raster.NrOfLinesPerImage);
+    raster.CellType = code_of(form.read("CellType"));
+    // Deliberate: any other text, in any other letter case, means little-endian.
+    raster.ByteOrder = form.read("ByteOrder") == "MSBFirst" ? 1 : 0;
+    return form.complete() && raster.CellType >= 0;
+}
 
 const char* message_of(int status) {
     switch (status) {
@@ -346,32 +365,25 @@ int DataFile::read_hdr(const char* file_name) {
     if (const int status = close()) return frame.callee(status);
     BufferSize = 0;
     if (setFilename(file_name) != QUO_OK) return frame.fail(QUO_REFUSED, "File name too long");
-    const std::string side_file = sideFile();
-    if (readSection(side_file.c_str()) == QUO_OK) return frame.success();
-
-    const quo::ProfileLook look{side_file.c_str()};
-    ProfileForm form{side_file.c_str()};
-    std::int32_t offset = static_cast<std::int32_t>(HeaderOffset);
-    form.read("HeaderOffset", offset);
-    HeaderOffset = offset;
-    form.read("RowPrefix", RowPrefix);
-    form.read("NrOfPixelsPerLine", NrOfPixelsPerLine);
-    form.read("NrOfLinesPerImage", NrOfLinesPerImage);
-    CellType = code_of(form.read("CellType"));
-    // Deliberate: any other text, in any other letter case, means little-endian.
-    ByteOrder = form.read("ByteOrder") == "MSBFirst" ? 1 : 0;
-    if (!form.complete() || CellType < 0) return frame.fail(QUO_REFUSED, "The raster's side file is incomplete");
-    return frame.success();
+    return quo::guarded(frame, [&] {
+        const std::string side_file = sideFile();
+        if (readSection(side_file.c_str()) == QUO_OK) return frame.success();
+        if (quo::RegistryAccess::unread(*this) == QUO_NO_MEMORY) return frame.callee(QUO_NO_MEMORY);
+        if (!read_profile(*this, side_file.c_str()))
+            return frame.fail(QUO_REFUSED, "The raster's side file is incomplete");
+        return frame.success();
+    });
 }
 
 int DataFile::write_hdr() {
     quo::CallFrame frame{"DataFile::write_hdr", kSource};
-    // Without a name the side file would be some ".hdr" of the working directory.
-    if (path().empty()) return frame.fail(QUO_REFUSED, "No raster named");
-    if (writeSection(sideFile().c_str()) != QUO_OK) {
-        return frame.fail(QUO_REFUSED, "The raster's side file cannot be written");
-    }
-    return frame.success();
+    return quo::guarded(frame, [&] {
+        // Without a name the side file would be some ".hdr" of the working directory.
+        if (path().empty()) return frame.fail(QUO_REFUSED, "No raster named");
+        if (writeSection(sideFile().c_str()) != QUO_OK)
+            return frame.fail(QUO_REFUSED, "The raster's side file cannot be written");
+        return frame.success();
+    });
 }
 
 int DataFile::clone(const DataFile* source) {
