@@ -1,9 +1,13 @@
 #include <gtest/gtest.h>
 #include <sys/mman.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
+#include <csignal>
 #include <cstdint>
+#include <filesystem>
 #include <optional>
 #include <random>
 #include <string>
@@ -227,15 +231,31 @@ TEST_F(BufferFileBytes, AFullDiskMovesLess) {
     }
 }
 
+/** The memory of a process that has ended takes no bytes, without an error. */
+void open_memory_of_dead_process(BufferFile& file) {
+    const pid_t process = fork();
+    if (process == 0) {
+        pause();
+        _exit(0);
+    }
+    ASSERT_GT(process, 0);
+    file.setFilename(("/proc/" + std::to_string(process) + "/mem").c_str());
+    file.open(BufferFile::READ_WRITE);
+    kill(process, SIGKILL);
+    waitpid(process, nullptr, 0);
+    ASSERT_EQ(file.status(), 0);
+}
+
 // Calls that the system lets down, in mode READ_WRITE with three bytes pending in a buffer of 16: they stay
 // pending, or are given up where the place leaves the buffer, and the status says so until the next open(). Once
-// nobody could tell, and a read that could not write them first slid the buffer away beneath them.
+// nobody could tell, and a read that could not write them first slid the buffer away beneath them; a write that
+// moved nothing had no status, and create() lost the error of a side file that it could not replace.
 TEST_F(BufferFileBytes, WhatTheSystemRefusesIsTold) {
     file_.NrOfPixelsPerLine = kLineSamples;
     file_.CellType = INT16;
     const struct {
         const char* name;
-        int status, error;  // 5: while the disk is full
+        int status, error;  // EFBIG: while the disk is full
         const char* start;  // of the file in the end
         void (*call)(BufferFile&);
     } rows[] = {
@@ -259,6 +279,18 @@ TEST_F(BufferFileBytes, WhatTheSystemRefusesIsTold) {
              f.setFilename("/no/raster");
              f.open(3);
          }},
+        {"nothing taken", 5, 0, "abc",
+         [](BufferFile& f) {
+             open_memory_of_dead_process(f);
+             EXPECT_EQ(f.write("w", 1), 0);
+         }},
+        {"create", 9, EISDIR, "abc",
+         [](BufferFile& f) {
+             char name[512];
+             f.getFilename(name);
+             std::filesystem::create_directory(std::string{name} + ".hdr");
+             EXPECT_EQ(f.create(), 9);
+         }},
     };
     for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
@@ -270,7 +302,7 @@ TEST_F(BufferFileBytes, WhatTheSystemRefusesIsTold) {
         ASSERT_EQ(file_.write("abc", 3), 3);
         {
             std::optional<test::FullDisk> full;
-            if (row.status == 5) full.emplace(0);
+            if (row.error == EFBIG) full.emplace(0);
             row.call(file_);
         }
         file_.close();

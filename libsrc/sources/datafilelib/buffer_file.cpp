@@ -97,9 +97,12 @@ int BufferFile::create() {
     if (!name_[0]) return QUO_REFUSED;
     try {
         // The side file is written last, perhaps hours from now: that it can be replaced is tried out before.
-        const bool describable = quo::AtomicFile{sideFile().c_str()}.good();
+        if (!quo::AtomicFile{sideFile().c_str()}.good()) {
+            note(QUO_NOT_OPENED);  // at once, for the next file resets errno
+            return status_;
+        }
         auto raster = std::make_unique<quo::AtomicFile>(name_);
-        if (!describable || !raster->good() || !stream_->open_same(raster->descriptor())) {
+        if (!raster->good() || !stream_->open_same(raster->descriptor())) {
             note(QUO_NOT_OPENED);
         } else {
             new_raster_ = std::move(raster);
@@ -319,7 +322,7 @@ int64_t BufferFile::slideForWriting(const char* src, int64_t n) {
 
 int64_t BufferFile::writeDirectly(const char* src, int64_t n) {
     const auto done = stream_->write_at(place(), src, static_cast<std::size_t>(n));
-    if (done.refused) note(QUO_WRITE_FAILED);
+    if (static_cast<int64_t>(done.bytes) != n) note(QUO_WRITE_FAILED);
     dropBuffer(place() + static_cast<int64_t>(done.bytes));
     return static_cast<int64_t>(done.bytes);
 }
