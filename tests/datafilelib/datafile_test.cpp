@@ -424,6 +424,19 @@ TEST_F(DataFileBytes, PairsAreReplacedWholeOrNotAtAll) {
     const std::string other = report_.file("0/x");
     EXPECT_EQ(file_.copy(other.c_str(), 0) + buffer.copy(other.c_str(), 0), 2) << "not to be overwritten";
 
+    const mode_t umask_before = umask(022);
+    const struct { unsigned source, copy; } modes[] = {{0600, 0600}, {0640, 0640}, {0666, 0644}, {0440, 0640}};
+    for (const auto& row : modes) {
+        for (std::size_t i = 0; i < 2; ++i) {
+            const std::string copy = report_.file("mode" + std::to_string(row.source) + std::to_string(i));
+            chmod(name_.c_str(), row.source);
+            EXPECT_EQ(writers[i](copy), 0);
+            struct stat found {};
+            EXPECT_TRUE(stat(copy.c_str(), &found) == 0 && (found.st_mode & 0777U) == row.copy) << row.source;
+        }
+    }
+    umask(umask_before);
+
     const std::string in = report_.file("in"), side = in + ".hdr", looped = report_.file("looped");
     std::filesystem::create_symlink("in.hdr", report_.file("shared.hdr"));
     std::filesystem::create_symlink("looped", looped + ".hdr");

@@ -135,6 +135,20 @@ bool replaces_a_needed_file(const char* from, const char* to) {
     return std::ranges::any_of(copy, is_needed) || same_file(copy[0], copy[1]);
 }
 
+// Takes from group and others what the source does not grant them. A group that is not the source's counts as
+// others.
+bool keep_closed(int source, int copy) {
+    struct stat from {
+    }, to{};
+    if (fstat(source, &from) != 0 || fstat(copy, &to) != 0) return false;
+    const mode_t others = from.st_mode & 07U,
+                 group = to.st_gid == from.st_gid ? from.st_mode & 070U : others << 3U;
+    const bool kept = fchmod(copy, to.st_mode & (0700U | group | others)) == 0;
+    if (!kept && errno != EPERM && errno != ENOTSUP) return false;  // as file systems without permissions answer
+    errno = 0;
+    return true;
+}
+
 }  // namespace
 
 std::optional<RasterRegion> region_of_samples(const RasterDescription& raster, std::int64_t first_line,
@@ -203,13 +217,15 @@ int write_region(const RasterStream& stream, const RasterRegion& region, const R
 std::string side_file_of(std::string_view raster) { return std::string{raster} + std::string{kSideSuffix}; }
 
 int copy_raster(const char* from, const char* to, bool overwrite, std::optional<AtomicFile>& copy) {
-    const bool refused = replaces_a_needed_file(from, to) || (!overwrite && access(to, F_OK) == 0);
+    const bool exists = access(to, F_OK) == 0;
+    const bool refused = replaces_a_needed_file(from, to) || (!overwrite && exists);
     errno = 0;  // that a file is missing is no failure here
     if (refused) return QUO_REFUSED;
     RasterStream source;
     if (!source.open(from, RasterStream::Mode::kRead)) return QUO_NOT_OPENED;
     copy.emplace(to);
-    return copy->good() ? copy_bytes(source, *copy) : QUO_NOT_OPENED;
+    if (!copy->good() || !(exists || keep_closed(source.descriptor(), copy->descriptor()))) return QUO_NOT_OPENED;
+    return copy_bytes(source, *copy);
 }
 
 }  // namespace quo

@@ -56,7 +56,8 @@ constexpr std::string_view kSideSuffix = ".hdr";
 std::string side_file_of(std::string_view raster);
 
 /** Copies a file's bytes as they are into a new file, which the caller commits. 0, 1 when the target exists and
- * must be kept, or where it or its side file is the source, the source's side file or the other, 4, 5, 7, 9. */
+ * must be kept, or where it or its side file is the source, the source's side file or the other, 4, 5, 7, 9. A
+ * file of a new name is open to nobody else whom its source is closed to; its owner may write it all the same. */
 int copy_raster(const char* from, const char* to, bool overwrite, std::optional<AtomicFile>& copy);
 
 }  // namespace quo
