@@ -364,7 +364,9 @@ TEST_F(DataFileBytes, AFullDiskGivesFiveAndLosesNothing) {
 
 // Raster and side file in three ways. Once they were written through names that could be foretold, over another's
 // file of that name; a mode of 0600 became 0644, a link a file; and a side file that failed left the new raster
-// beside the old description.
+// beside the old description. Later, copies to new names were still open to all whatever their source was, and
+// only the rasters were held apart: a copy could take the place of its source's side file, or its side file that
+// of the source.
 TEST_F(DataFileBytes, PairsAreReplacedWholeOrNotAtAll) {
     const test::CapturedStderr silent;
     describe(file_, 4, 15, INT8, 0, 0, 0);
@@ -421,8 +423,34 @@ TEST_F(DataFileBytes, PairsAreReplacedWholeOrNotAtAll) {
     }
     const std::string other = report_.file("0/x");
     EXPECT_EQ(file_.copy(other.c_str(), 0) + buffer.copy(other.c_str(), 0), 2) << "not to be overwritten";
-    EXPECT_EQ(file_.copy(name_.c_str()) + buffer.copy(name_.c_str()), 2) << "onto itself";
-    EXPECT_EQ(test::read_text(name_), content_);
+
+    const mode_t umask_before = umask(022);
+    const struct { unsigned source, copy; } modes[] = {{0600, 0600}, {0640, 0640}, {0666, 0644}, {0440, 0640}};
+    for (const auto& row : modes) {
+        for (std::size_t i = 0; i < 2; ++i) {
+            const std::string copy = report_.file("mode" + std::to_string(row.source) + std::to_string(i));
+            chmod(name_.c_str(), row.source);
+            EXPECT_EQ(writers[i](copy), 0);
+            struct stat found {};
+            EXPECT_TRUE(stat(copy.c_str(), &found) == 0 && (found.st_mode & 0777U) == row.copy) << row.source;
+        }
+    }
+    umask(umask_before);
+
+    const std::string in = report_.file("in"), side = in + ".hdr", looped = report_.file("looped");
+    std::filesystem::create_symlink("in.hdr", report_.file("shared.hdr"));
+    std::filesystem::create_symlink("looped", looped + ".hdr");
+    const std::string description = test::read_text(report_.file("0/x.hdr"));
+    const struct {
+        std::string from, to;
+    } onto[] = {{in, in}, {in, side}, {side, in}, {in, report_.file("shared")}, {in, looped}};
+    for (const auto& row : onto) {
+        for (const std::string& file : {in, side, looped}) test::write_text(file, description);
+        file_.setFilename(row.from.c_str());
+        buffer.setFilename(row.from.c_str());
+        EXPECT_EQ(file_.copy(row.to.c_str()) + buffer.copy(row.to.c_str()), 2) << row.from << " to " << row.to;
+        for (const std::string& file : {in, side, looped}) EXPECT_EQ(test::read_text(file), description);
+    }
 }
 
 // Until it is complete and committed, a new raster leaves an older one alone.

@@ -18,8 +18,6 @@
 
 namespace {
 
-constexpr std::string_view kSideSuffix = ".hdr";
-
 /** Requests that fail are ignored, so nothing may be left in errno for the next tracked function to report; and
  * nothing may come in, for errno is kept as the cause of a failure. */
 class QuietErrno {
@@ -60,14 +58,14 @@ void BufferFile::setFilename(const char* file_name) {
 }
 void BufferFile::getFilename(char* file_name) const { quo::copy_bounded(file_name, sizeof name_, name_); }
 bool BufferFile::is_open() const { return stream_->is_open(); }
-std::string BufferFile::sideFile() const { return std::string{name_} + std::string{kSideSuffix}; }
+std::string BufferFile::sideFile() const { return quo::side_file_of(name_); }
 bool BufferFile::exists() const { return quo::raster_exists(name_); }
 
 int BufferFile::readhdr(const char* header_name) {
     const Quiet quiet;
     close();
     std::string_view name = quo::text_or_empty(header_name);
-    name.remove_suffix(std::min(name.size(), kSideSuffix.size()));
+    name.remove_suffix(std::min(name.size(), quo::kSideSuffix.size()));
     setFilename(std::string{name}.c_str());
     return name.empty() || name_[0] != '\0' ? readSection(header_name) : QUO_REFUSED;
 }

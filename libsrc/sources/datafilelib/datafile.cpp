@@ -30,7 +30,6 @@ constexpr const char* kSource = "datafile";
 constexpr const char* kSection = "RasterInfo";
 constexpr const char* kReadFailed = "File reading failed!";
 constexpr const char* kWriteFailed = "File writing failed!";
-constexpr const char* kSideSuffix = ".hdr";
 constexpr int kDescriptionElements = 6;
 
 struct CellName {
@@ -181,7 +180,7 @@ int RasterDescription::copyPair(const char* from, const char* to, bool overwrite
     try {
         std::optional<quo::AtomicFile> raster;
         const int status = quo::copy_raster(from, to, overwrite, raster);
-        return status != QUO_OK ? status : commitPair(*raster, (std::string{to} + kSideSuffix).c_str());
+        return status != QUO_OK ? status : commitPair(*raster, quo::side_file_of(to).c_str());
     } catch (const std::bad_alloc&) {
         return QUO_NO_MEMORY;
     }
@@ -195,7 +194,7 @@ std::string DataFile::path() const {
     const std::size_t length = strnlen(FileName, sizeof FileName);
     return {FileName, length < sizeof FileName ? length : 0};
 }
-std::string DataFile::sideFile() const { return path() + kSideSuffix; }
+std::string DataFile::sideFile() const { return quo::side_file_of(path()); }
 
 int DataFile::setFilename(const char* file_name) {
     const std::string_view name = quo::text_or_empty(file_name);

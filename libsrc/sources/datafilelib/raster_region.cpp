@@ -4,6 +4,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <array>
 #include <cerrno>
 #include <cstring>
 
@@ -118,11 +119,34 @@ int copy_bytes(const RasterStream& from, AtomicFile& to) {
     return QUO_OK;
 }
 
-bool same_file(const char* a, const char* b) {
+bool same_file(const std::string& a, const std::string& b) {
     struct stat first {
     }, second{};
-    return stat(a, &first) == 0 && stat(b, &second) == 0 && first.st_dev == second.st_dev &&
+    return stat(a.c_str(), &first) == 0 && stat(b.c_str(), &second) == 0 && first.st_dev == second.st_dev &&
            first.st_ino == second.st_ino;
+}
+
+// Whether a copy would take the place of a file that it is made from, or its side file the place of the copy.
+bool replaces_a_needed_file(const char* from, const char* to) {
+    const std::array source{std::string{from}, side_file_of(from)}, copy{std::string{to}, side_file_of(to)};
+    const auto is_needed = [&](const std::string& written) {
+        return std::ranges::any_of(source, [&](const std::string& read) { return same_file(read, written); });
+    };
+    return std::ranges::any_of(copy, is_needed) || same_file(copy[0], copy[1]);
+}
+
+// Takes from group and others what the source does not grant them. A group that is not the source's counts as
+// others.
+bool keep_closed(int source, int copy) {
+    struct stat from {
+    }, to{};
+    if (fstat(source, &from) != 0 || fstat(copy, &to) != 0) return false;
+    const mode_t others = from.st_mode & 07U,
+                 group = to.st_gid == from.st_gid ? from.st_mode & 070U : others << 3U;
+    const bool kept = fchmod(copy, to.st_mode & (0700U | group | others)) == 0;
+    if (!kept && errno != EPERM && errno != ENOTSUP) return false;  // as file systems without permissions answer
+    errno = 0;
+    return true;
 }
 
 }  // namespace
@@ -190,14 +214,18 @@ int write_region(const RasterStream& stream, const RasterRegion& region, const R
     return QUO_OK;
 }
 
+std::string side_file_of(std::string_view raster) { return std::string{raster} + std::string{kSideSuffix}; }
+
 int copy_raster(const char* from, const char* to, bool overwrite, std::optional<AtomicFile>& copy) {
-    const bool refused = same_file(from, to) || (!overwrite && access(to, F_OK) == 0);
+    const bool exists = access(to, F_OK) == 0;
+    const bool refused = replaces_a_needed_file(from, to) || (!overwrite && exists);
     errno = 0;  // that a file is missing is no failure here
     if (refused) return QUO_REFUSED;
     RasterStream source;
     if (!source.open(from, RasterStream::Mode::kRead)) return QUO_NOT_OPENED;
     copy.emplace(to);
-    return copy->good() ? copy_bytes(source, *copy) : QUO_NOT_OPENED;
+    if (!copy->good() || !(exists || keep_closed(source.descriptor(), copy->descriptor()))) return QUO_NOT_OPENED;
+    return copy_bytes(source, *copy);
 }
 
 }  // namespace quo

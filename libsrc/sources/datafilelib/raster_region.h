@@ -4,6 +4,8 @@
 #include <cstddef>
 #include <cstdint>
 #include <optional>
+#include <string>
+#include <string_view>
 
 #include "datafilelib/raster_stream.h"
 #include "datafilelib/sample_kernels.h"
@@ -49,8 +51,13 @@ int read_region(const RasterStream& stream, const RasterRegion& region, const Re
 int write_region(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout,
                  const char* from);
 
+constexpr std::string_view kSideSuffix = ".hdr";
+/** Name of the file that describes a raster. */
+std::string side_file_of(std::string_view raster);
+
 /** Copies a file's bytes as they are into a new file, which the caller commits. 0, 1 when the target exists and
- * must be kept or is the source itself, 4, 5, 7, 9. */
+ * must be kept, or where it or its side file is the source, the source's side file or the other, 4, 5, 7, 9. A
+ * file of a new name is open to nobody else whom its source is closed to; its owner may write it all the same. */
 int copy_raster(const char* from, const char* to, bool overwrite, std::optional<AtomicFile>& copy);
 
 }  // namespace quo

@@ -30,6 +30,7 @@ public:
     /** False when what was written could not be handed to the disk. */
     bool close() noexcept;
     [[nodiscard]] bool is_open() const noexcept { return descriptor_ >= 0; }
+    [[nodiscard]] int descriptor() const noexcept { return descriptor_; }
     /** Bytes in the file, or nothing when they cannot be told. */
     [[nodiscard]] std::optional<std::int64_t> length() const noexcept;
 
