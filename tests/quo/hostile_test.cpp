@@ -141,6 +141,13 @@ TEST_F(HostileFiles, HeadersAndRastersAnswerToBothNames) {
                                                     {"vrt", name}})
             EXPECT_EQ(test::quo(job).exit_status, 0) << testing::PrintToString(job);
     }
+    // A header with another one beside it: `set p` used to change p.hdr.
+    const std::string header = file("p"), scene = test::read_text(test::scene_file(test::scenes().front()));
+    test::write_text(header, scene);
+    test::write_text(header + ".hdr", scene);
+    EXPECT_EQ(test::quo({"set", header, "SamplingConstants/prf_hz", "17.3"}).exit_status, 0);
+    EXPECT_NE(test::read_text(header), scene);
+    EXPECT_EQ(test::read_text(header + ".hdr"), scene);
 }
 
 TEST_F(HostileFiles, AFullStandardOutputIsAFailure) {

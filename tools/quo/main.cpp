@@ -6,6 +6,7 @@
 #include <string_view>
 
 #include "commands.h"
+#include "document.h"
 #include "failure.h"
 #include "interrupt.h"
 
@@ -22,9 +23,11 @@ bool is_file(const std::string& name) {
     return std::filesystem::is_regular_file(name, error);
 }
 
-// A product is known by either of its names.
+// A product is known by either of its names. A file that is a header itself is the one that is meant, even with
+// another one beside it.
 std::string header_name(const std::string& name) {
-    return !name.ends_with(".hdr") && is_file(name + ".hdr") ? name + ".hdr" : name;
+    if (name.ends_with(".hdr") || !is_file(name + ".hdr")) return name;
+    return is_file(name) && tool::Document::in(name) ? name : name + ".hdr";
 }
 std::string raster_name(const std::string& name) {
     return name.ends_with(".hdr") && !is_file(name + ".hdr") ? name.substr(0, name.size() - 4) : name;
