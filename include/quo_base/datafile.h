@@ -71,9 +71,9 @@ protected:
     int readSection(const char* side_file);
     /** Writes it; 0 or a failing status, 1 also for a HeaderOffset that an integer of the file cannot hold. */
     int writeSection(const char* side_file);
-    /** Makes a new raster and its side file, with this description, the files of their names: both or neither. An
-     * older side file keeps its other sections. 0; 1 as writeSection(); 5, 7; 9 where the side file cannot be
-     * replaced. */
+    /** Makes a new raster and its side file, with this description, the files of their names, both or neither but
+     * for what DataFile::copy() tells. An older side file keeps its other sections. 0; 1 as writeSection(); 5, 7;
+     * 9 where the side file cannot be replaced. */
     int commitPair(quo::AtomicFile& raster, const char* side_file);
     /** Copies a raster and describes the copy in its side file, as commitPair() does; otherwise as
      * DataFile::copy(). */
@@ -131,9 +131,13 @@ public:
      * first. 0 or the status of the close. */
     int clone(const DataFile* source);
     /** Writes raster and side file under another name. Both become new together when all of it is on the disk;
-     * until then, and whenever anything fails, older ones stay as they are. Permissions of older files are kept,
-     * symbolic links to them followed; their side file keeps its other sections. With `overwrite` 0 an existing
-     * raster is kept and 1 returned. 0; 1 also onto itself; 4, 5, 7; 9 also where either file cannot be made. */
+     * until then, and whenever anything fails, older ones stay as they are. Two exceptions: where both have to be
+     * written in place, as in a folder that takes no new files, a failure in that last step can leave a mixture;
+     * and a process that is killed between the two renames leaves the new raster beside the old description.
+     * Permissions of older files are kept, symbolic links to them followed; their side file keeps its other
+     * sections. A raster of a new name grants group and others no more than its source does. With `overwrite` 0 an
+     * existing raster is kept and 1 returned. 0; 1 also where the copy's raster or side file is the source's, by
+     * whatever name, or both are one file; 4, 5, 7; 9 also where either file cannot be made. */
     int copy(const char* file_name, int overwrite = 1);
 
     /** Names the raster; a name of 512 bytes or more is refused (1). */
@@ -275,7 +279,8 @@ public:
      * where the raster or its side file cannot be replaced. */
     int create();
     /** The raster that create() started is complete: when all of it is on the disk, it and a side file with its
-     * description take their names, both or neither. Permissions, links and other sections are kept as by copy().
+     * description take their names, both or neither but where both have to be written in place or the process is
+     * killed in that step, as DataFile::copy() tells. Permissions, links and other sections are kept as there.
      * The file is closed in any case. 0; 1 without create() or where the description makes no raster; 5 also where
      * fewer bytes were written than it needs; the first failure before; 7, 9. */
     int commit();
