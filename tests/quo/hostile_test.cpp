@@ -206,6 +206,23 @@ TEST_F(HostileFiles, ConversionsThatRunOutOfRoomLeaveTheOlderPairWhole) {
     EXPECT_TRUE(test::read_text(out) == test::read_text(in));
 }
 
+// A file that is there, but on which every read fails, used to pass for an empty one: "holds no object of a
+// product".
+TEST_F(HostileFiles, HeadersThatCannotBeReadAreNotCalledEmpty) {
+    const std::string header = "/proc/self/mem", field = "ROI/Lines";
+    for (const std::vector<std::string>& job : {std::vector<std::string>{"info", header},
+                                                {"validate", header},
+                                                {"orbit", header},
+                                                {"derive", header},
+                                                {"get", header, field},
+                                                {"set", header, field, "17"},
+                                                {"config", "check", header}}) {
+        const test::Finished finished = test::quo(job);
+        EXPECT_EQ(finished.exit_status, 1);
+        EXPECT_EQ(finished.err, "quo: /proc/self/mem: cannot be read: Input/output error\n") << job[0];
+    }
+}
+
 TEST_F(HostileFiles, AFullStandardOutputIsAFailure) {
     const std::string scene = test::scene_file(test::scenes().front());
     for (const std::string job : {"info", "validate", "footprint", "orbit", "get"}) {

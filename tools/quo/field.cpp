@@ -63,6 +63,7 @@ private:
     /** Whether any element has the path. */
     bool read(const std::string& path) {
         constexpr int kChannel = 1;
+        forget_system_error();
         const int status = quorelxml::readTexts(file_.c_str(), kChannel, path.c_str(), [&](std::string_view text) {
             ++count_;
             if (json_)
@@ -70,10 +71,7 @@ private:
             else
                 (lines_ += shown(text)) += '\n';
         });
-        if (status == QUO_READ_FAILED) throw Failure(file_ + ": cannot be read");
-        if (status == QUO_NO_MEMORY) throw Failure(file_ + ": does not fit into memory");
-        if (status != QUO_OK)
-            throw Failure(file_ + ": " + Document::or_xml_defect(file_, "is no header document"));
+        if (status != QUO_OK) refuse_header(file_, status, "is no header document");
         return count_ > 0;
     }
 
