@@ -183,6 +183,7 @@ TEST_F(HostileFiles, FullDisksLeaveOlderFilesWhole) {
         SCOPED_TRACE(job.front());
         const std::string said = with_room(0, job);
         EXPECT_THAT(said, testing::MatchesRegex("quo: [^\n]*File too large[^\n]*\nexit 1\n"));
+        EXPECT_THAT(said, Not(HasSubstr("quo_config"))) << "a temporary file in place of the user's";
         EXPECT_EQ(files(), before);
     }
     for (const char* name : {"out.raw", "out.png", "out.csv", "in.raw.vrt"})
