@@ -2,6 +2,7 @@
 #include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <csignal>
@@ -12,6 +13,7 @@
 #include <vector>
 
 #include "raster_folder.h"
+#include "support/limits.h"
 
 namespace {
 
@@ -148,6 +150,41 @@ TEST_F(HostileFiles, HeadersAndRastersAnswerToBothNames) {
     EXPECT_EQ(test::quo({"set", header, "SamplingConstants/prf_hz", "17.3"}).exit_status, 0);
     EXPECT_NE(test::read_text(header), scene);
     EXPECT_EQ(test::read_text(header + ".hdr"), scene);
+}
+
+// A file that is there, but on which every read fails, used to pass for an empty one: "holds no object of a
+// product".
+TEST_F(HostileFiles, HeadersThatCannotBeReadAreNotCalledEmpty) {
+    const std::string header = "/proc/self/mem", field = "ROI/Lines";
+    for (const std::vector<std::string>& job : {std::vector<std::string>{"info", header},
+                                                {"validate", header},
+                                                {"orbit", header},
+                                                {"derive", header},
+                                                {"get", header, field},
+                                                {"set", header, field, "17"},
+                                                {"config", "check", header}}) {
+        const test::Finished finished = test::quo(job);
+        EXPECT_EQ(finished.exit_status, 1);
+        EXPECT_EQ(finished.err, "quo: /proc/self/mem: cannot be read: Input/output error\n") << job[0];
+    }
+}
+
+// In a folder without the right to write the file itself is overwritten, which is less safe: nothing told so.
+TEST_F(HostileFiles, OutputsWrittenInPlaceAreTold) {
+    const std::string out = file("out.csv"), scene = test::scene_file(test::scenes().front());
+    test::write_text(out, "older");
+    chmod(out.c_str(), 0666);
+    chmod(folder_.path().c_str(), 0555);
+    test::Finished finished;
+    {
+        const test::OrdinaryUser user;
+        finished =
+            test::quo({"geolocate", scene, "--to", "ground", "--output", out}, "azimuth_time_s,range_time_s\n");
+    }
+    chmod(folder_.path().c_str(), 0755);
+    EXPECT_EQ(finished.exit_status, 0);
+    EXPECT_EQ(finished.err, "quo: " + out + ": written in place, no other file can be put there\n");
+    EXPECT_THAT(test::read_text(out), HasSubstr("latitude_deg"));
 }
 
 TEST_F(HostileFiles, AFullStandardOutputIsAFailure) {

@@ -92,6 +92,9 @@ TEST_F(RasterVerbs, RefusalsNameFileAndCauseAndLeaveNothing) {
         {"BadHeader", {"convert", file("bad.raw"), "OUT"}, 1, "no complete description"},
         {"BadLines", {"convert", in, "OUT", "--lines", "3:9"}, 2, "no part of 0:4"},
         {"BadType", {"convert", in, "OUT", "--type", "INT99"}, 2, "INT99"},
+        // Of a name that the system does not even look up nothing is known, least of all that it is no regular
+        // file.
+        {"EndlessName", {"convert", in, file(std::string(300, 'x'))}, 1, "x: File name too long"},
         {"FolderAsTarget", {"convert", in, folder_.path().string()}, 1, "no regular file"},
         {"NoSuchFolder",
          {"convert", in, file("no/out.raw")},

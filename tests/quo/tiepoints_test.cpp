@@ -65,10 +65,12 @@ TEST(TiePoints, WrongGeometryShows) {
     std::string header = test::read_text(scene_file(kSea));
     const std::string right = "<LookDirection>1<";
     header.replace(header.find(right), right.size(), "<LookDirection>-1<");
-    test::write_text(folder.file("mirrored.xml"), header);
+    const std::string name = "mirrored\u202E";  // came back escaped twice
+    test::write_text(folder.file(name + ".xml"), header);
     const auto mirrored = nlohmann::json::parse(
-        quo({"tiepoints", "--json", folder.file("mirrored.xml"), "--points", scene_file(kSea, "_tie_points.csv")})
+        quo({"tiepoints", "--json", folder.file(name + ".xml"), "--points", scene_file(kSea, "_tie_points.csv")})
             .out);
+    EXPECT_EQ(mirrored[0].at("scene"), name);
     EXPECT_GT(mirrored[0].at("ground_position_m").at("largest").get<double>(), 1e5);
 
     const auto normal =

@@ -170,10 +170,12 @@ int document(const std::vector<std::string>& names) {
 /** A file in the folder of temporary files that goes with the object. */
 class ScratchFile {
 public:
-    ScratchFile() {
-        const auto pattern = std::filesystem::temp_directory_path() / "quo_config_XXXXXX";
-        folder_ = pattern.string();
-        if (!mkdtemp(folder_.data())) throw Failure(folder_ + ": " + system_cause());
+    /** For the new content of a file, which failures name: the user never sees this one. */
+    explicit ScratchFile(std::string file) : file_{std::move(file)} {
+        std::error_code error;
+        folder_ = (std::filesystem::temp_directory_path(error) / "quo_config_XXXXXX").string();
+        if (error) fail(error.message());
+        if (!mkdtemp(folder_.data())) fail(system_cause());
     }
     ~ScratchFile() {
         std::error_code ignored;
@@ -183,24 +185,32 @@ public:
     ScratchFile& operator=(const ScratchFile&) = delete;
 
     [[nodiscard]] std::string name() const { return folder_ + "/configuration.xml"; }
+    void take_file() const {
+        std::error_code error;
+        std::filesystem::copy_file(file_, name(), error);
+        if (error) fail(error.message());
+    }
     [[nodiscard]] std::string text() const {
         std::ifstream stream{name(), std::ios::binary};
         // What cannot be opened would look empty, and take the place of the file that records are added to.
-        if (!stream) throw Failure(name() + ": " + system_cause());
+        if (!stream) fail(system_cause());
         return {std::istreambuf_iterator<char>{stream}, {}};
     }
 
 private:
-    std::string folder_;
+    [[noreturn]] void fail(const std::string& cause) const {
+        throw Failure(file_ + ": cannot be prepared among the temporary files: " + cause);
+    }
+
+    std::string file_, folder_;
 };
 
 ConfigurationReview review_of(const std::string& file) {
     require_header_file(file);
     ConfigurationReview review;
+    forget_system_error();
     const int status = reviewConfiguration(file.c_str(), kChannel, review);
-    if (status == QUO_REFUSED)
-        throw Failure(file + ": " + Document::or_xml_defect(file, "is no configuration file"));
-    if (status != QUO_OK) throw Failure(file + ": status " + status_text(status));
+    if (status != QUO_OK) refuse_header(file, status, "is no configuration file");
     return review;
 }
 
@@ -215,13 +225,13 @@ void keep_what_is_there(const ConfigOptions& options, const ScratchFile& scratch
         if (names_section(review, name) && !options.replace)
             throw Failure(options.file + ": has a record " + name + " (--replace writes its defaults)");
     }
-    std::filesystem::copy_file(options.file, scratch.name());
+    scratch.take_file();
 }
 
 int write_new(const ConfigOptions& options) {
     std::vector<std::unique_ptr<Record>> records;
     for (const std::string& name : options.records) records.push_back(record_of(name));
-    const ScratchFile scratch;
+    const ScratchFile scratch{options.file};
     if (options.file != "-") keep_what_is_there(options, scratch);
     for (const auto& record : records) record->writepar(scratch.name().c_str(), kChannel);
     Output output{options.file};

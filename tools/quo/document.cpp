@@ -4,10 +4,22 @@
 #include <filesystem>
 #include <fstream>
 #include <string_view>
+#include <system_error>
 
 #include "failure.h"
 
 namespace tool {
+namespace {
+
+/** What is no XML in a file, and on which line, where XML is what it means to be, else `cause`. */
+std::string xml_defect_or(const std::string& file, const std::string& cause) {
+    char first = '\0';
+    std::ifstream{file} >> first;  // the first that is no blank
+    const std::string defect = first == '<' ? quorelxml::xmlDefect(file.c_str()) : "";
+    return defect.empty() ? cause : "is no XML, " + defect;
+}
+
+}  // namespace
 
 void require_header_file(const std::string& file) {
     static_assert(quorelxml::kMostFileBytes == 1LL << 30);
@@ -21,21 +33,19 @@ void require_header_file(const std::string& file) {
         throw Failure(file + ": is larger than 1 GiB, the limit of a header");
 }
 
+void refuse_header(const std::string& file, int status, const std::string& cause) {
+    if (status == QUO_NO_MEMORY) throw Failure(file + ": does not fit into memory");
+    if (const int error = quo_take_system_error())
+        throw Failure(file + ": cannot be read: " + std::generic_category().message(error));
+    throw Failure(file + ": " + xml_defect_or(file, cause));
+}
+
 Document::Document(const std::string& file) : file_{file} {
     require_header_file(file);
     storeFileName(file.c_str());
+    forget_system_error();
     const int status = parse();
-    if (status == QUO_READ_FAILED) throw Failure(file + ": cannot be read");
-    if (status == QUO_NO_MEMORY) throw Failure(file + ": does not fit into memory");
-    if (status != QUO_OK || !isRecognized())
-        throw Failure(file + ": " + or_xml_defect(file, "is no header document"));
-}
-
-std::string Document::or_xml_defect(const std::string& file, const std::string& cause) {
-    char first = '\0';
-    std::ifstream{file} >> first;  // the first that is no blank
-    const std::string defect = first == '<' ? xmlDefect(file.c_str()) : "";
-    return defect.empty() ? cause : "is no XML, " + defect;
+    if (status != QUO_OK || !isRecognized()) refuse_header(file, status, "is no header document");
 }
 
 bool Document::in(const std::string& file) {

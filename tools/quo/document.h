@@ -13,6 +13,11 @@ namespace tool {
  * device, not to be opened, or too large. */
 void require_header_file(const std::string& file);
 
+/** Throws Failure for a header that a call of the library answered `status` for: with the system's reason where
+ * the file could not be read, which looks like an empty one otherwise, else with what is no XML in it, else with
+ * `cause`. forget_system_error() comes before the call. */
+[[noreturn]] void refuse_header(const std::string& file, int status, const std::string& cause);
+
 /** A header document in memory: the fields of channel 1 as texts, by their path, such as
  * "SamplingConstants/prf_hz". A path that is no chain of names is found nowhere. */
 class Document : private quorelxml {
@@ -23,10 +28,6 @@ public:
     explicit Document(const std::string& file);
     /** Whether a file is a header document. */
     static bool in(const std::string& file);
-
-    /** Why a file that should be a header is none: what is no XML in it, and on which line, where that is what it
-     * means to be, else `cause`. */
-    static std::string or_xml_defect(const std::string& file, const std::string& cause);
 
     [[nodiscard]] bool has_channel() const { return channelExists(kChannel); }
     [[nodiscard]] bool has(const std::string& path) const { return fieldExists(kChannel, path.c_str()); }

@@ -32,6 +32,11 @@ std::string status_text(int status) {
     return known == std::end(kMeanings) ? number : number + " (" + known->text + ")";
 }
 
+void forget_system_error() {
+    errno = 0;
+    (void)quo_take_system_error();
+}
+
 std::string library_cause(int status) {
     const int error = quo_take_system_error();
     return error != 0 ? std::generic_category().message(error) : "status " + status_text(status);

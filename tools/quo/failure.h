@@ -31,6 +31,10 @@ std::string system_cause();
 /** What a status code of the library means, such as "12 (not seen from this orbit)". */
 std::string status_text(int status);
 
+/** To be called before a call of the library whose failure is to be explained: what is older has nothing to do
+ * with it, neither what the library knows nor an errno, which its functions would take for one of theirs. */
+void forget_system_error();
+
 /** The same of the last failure within the library, else what its status means. */
 std::string library_cause(int status);
 
@@ -38,7 +42,7 @@ std::string library_cause(int status);
  */
 template <typename Call>
 void require_done(const std::string& file, const char* cannot, Call call) {
-    (void)quo_take_system_error();  // what is older has nothing to do with it
+    forget_system_error();
     if (const int status = call()) throw Failure(file + ": " + cannot + ": " + library_cause(status));
 }
 

@@ -43,6 +43,10 @@ nlohmann::json as_json(const std::string& text, bool numeric) {
     return whole ? nlohmann::json(static_cast<std::int64_t>(*number)) : nlohmann::json(*number);
 }
 
+std::string json_text(const nlohmann::json& value) {
+    return shown(value.dump(-1, ' ', false, nlohmann::json::error_handler_t::replace));
+}
+
 /** The values of a field, read without the document: headers can be far larger than one field of them. */
 class FieldReader {
 public:
@@ -53,32 +57,28 @@ public:
         if (!is_array_ && !read(options.field)) throw Failure(file_ + ": has no field " + options.field);
     }
 
-    [[nodiscard]] const std::string& lines() const { return lines_; }
-    /** One value, or the list of an array. */
-    [[nodiscard]] nlohmann::json value() && {
-        return count_ == 1 && !is_array_ ? std::move(list_[0]) : std::move(list_);
-    }
+    /** The values: in JSON those of an object's member, separated by commas, else lines. */
+    [[nodiscard]] const std::string& text() const { return text_; }
+    /** Whether they make a list in JSON. */
+    [[nodiscard]] bool is_list() const { return count_ != 1 || is_array_; }
 
 private:
     /** Whether any element has the path. */
     bool read(const std::string& path) {
         constexpr int kChannel = 1;
+        forget_system_error();
         const int status = quorelxml::readTexts(file_.c_str(), kChannel, path.c_str(), [&](std::string_view text) {
-            ++count_;
+            ++count_;  // a tree of all values would take many times the memory of their text
             if (json_)
-                list_.push_back(as_json(std::string{text}, numeric_));
+                (text_ += count_ > 1 ? ",\n    " : "") += json_text(as_json(std::string{text}, numeric_));
             else
-                (lines_ += shown(text)) += '\n';
+                (text_ += shown(text)) += '\n';
         });
-        if (status == QUO_READ_FAILED) throw Failure(file_ + ": cannot be read");
-        if (status == QUO_NO_MEMORY) throw Failure(file_ + ": does not fit into memory");
-        if (status != QUO_OK)
-            throw Failure(file_ + ": " + Document::or_xml_defect(file_, "is no header document"));
+        if (status != QUO_OK) refuse_header(file_, status, "is no header document");
         return count_ > 0;
     }
 
-    std::string file_, lines_;
-    nlohmann::json list_ = nlohmann::json::array();
+    std::string file_, text_;
     bool json_, numeric_, is_array_ = false;
     std::int64_t count_ = 0;
 };
@@ -86,13 +86,13 @@ private:
 int get_field(const FieldOptions& options) {
     require_field(options.field);
     FieldReader reader{options};
-    if (options.json) {
-        print_json({{"field", options.field}, {"value", std::move(reader).value()}});
-    } else {
-        Output output{"-"};
-        output.write(reader.lines());
-        output.commit();
-    }
+    Output output{"-"};
+    if (options.json)
+        output.write("{\n  \"field\": " + json_text(options.field) +
+                     ",\n  \"value\": " + (reader.is_list() ? "[\n    " : ""));
+    output.write(reader.text());
+    if (options.json) output.write(reader.is_list() ? "\n  ]\n}\n" : "\n}\n");
+    output.commit();
     return kFine;
 }
 

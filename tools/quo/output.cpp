@@ -69,7 +69,9 @@ void Output::write_directly() {
 
 void Output::commit() {
     flush();
-    if (file_ && !file_->commit()) fail();
+    if (!file_) return;
+    if (!file_->commit()) fail();
+    if (file_->in_place()) complain(name_ + ": written in place, no other file can be put there");
 }
 
 }  // namespace tool

@@ -33,12 +33,13 @@ bool is_known(const geopoint& point) {
 
 void read_product(const std::string& header, GeneralSAR& product) {
     require_header_file(header);
-    if (product.GSread(header.c_str()) != QUO_OK) throw Failure(header + ": cannot be read");
+    forget_system_error();
+    if (const int status = product.GSread(header.c_str())) refuse_header(header, status, "cannot be read");
     for (int object = gsRoi; object < GeneralSAR::kObjects; ++object) {
         if (product.GSexists(static_cast<GSObject>(object))) return;
     }
     if (described_raster(product) != nullptr) return;
-    throw Failure(header + ": " + Document::or_xml_defect(header, "holds no object of a product"));
+    refuse_header(header, QUO_OK, "holds no object of a product");
 }
 
 const char* section_of(GSObject object) { return kSections[static_cast<std::size_t>(object)]; }

@@ -54,9 +54,12 @@ void narrow(const dcomplex* from, std::size_t count, signed char* to) {
 
 bool is_narrow(const RasterDescription& raster) { return raster.CellType >= INT8_COMPLEX; }
 
+/** What a name stands for; throws Failure where the system does not tell. */
 std::filesystem::file_type kind_of(const std::string& name) {
     std::error_code error;
-    return std::filesystem::status(name, error).type();
+    const auto kind = std::filesystem::status(name, error).type();
+    if (kind == std::filesystem::file_type::none) throw Failure(name + ": " + error.message());
+    return kind;
 }
 bool can_be_replaced(const std::string& name) {
     const auto kind = kind_of(name);

@@ -17,7 +17,8 @@ void require_document(const std::string& file, bool may_be_missing) {
     std::error_code error;
     if (may_be_missing && std::filesystem::status(file, error).type() == std::filesystem::file_type::not_found)
         return;
-    if (!Document::in(file)) throw Failure(file + ": " + Document::or_xml_defect(file, "is no header document"));
+    forget_system_error();
+    if (!Document::in(file)) refuse_header(file, QUO_REFUSED, "is no header document");
 }
 
 }  // namespace tool

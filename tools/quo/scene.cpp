@@ -39,8 +39,9 @@ std::vector<std::string> check(const GeneralSAROrbit& orbit) {
  * all. */
 std::string why_no_orbit(const char* header, int status) {
     SAROrbitStateVectors_Obj vectors;
-    if (vectors.readhdr(header) != 0 || vectors.nSV_n < 1)
-        return Document::or_xml_defect(header, "no state vectors that can be read");
+    forget_system_error();
+    const int unread = vectors.readhdr(header);
+    if (unread != 0 || vectors.nSV_n < 1) refuse_header(header, unread, "no state vectors that can be read");
     GeneralSAROrbit orbit;
     const auto values = static_cast<std::ptrdiff_t>(vectors.nSV_n) * 3;
     if (orbit.SVCreate(vectors.t0SV_s, vectors.dtSV_s, vectors.nSV_n) != 0)

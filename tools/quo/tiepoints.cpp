@@ -140,7 +140,7 @@ Agreement check_scene(const std::string& header, const TiepointsOptions& options
                                              table.need("latitude_deg"),   table.need("longitude_deg"),
                                              table.need("height_m"),       table.need("incidence_deg")};
     Agreement agreement{
-        .scene = shown(scene_name(header)), .vertical = vertical_of(table, options.incidence), .residuals = {}};
+        .scene = scene_name(header), .vertical = vertical_of(table, options.incidence), .residuals = {}};
     while (table.next()) {
         ++agreement.points;
         const int status = compare(scene.orbit(), tie_point(table, columns), agreement);
@@ -158,7 +158,8 @@ std::string padded(const std::string& text, std::size_t width) {
 constexpr std::size_t kNumberWidth = 11;
 
 std::string as_row(const Agreement& agreement, std::size_t name_width) {
-    std::string row = agreement.scene + std::string(name_width - agreement.scene.size(), ' ') +
+    const std::string name = shown(agreement.scene);
+    std::string row = name + std::string(name_width - name.size(), ' ') +
                       padded(std::to_string(agreement.points), 8) + padded(std::to_string(agreement.solved()), 8);
     for (const Residuals& residual : agreement.residuals)
         for (const double value : {residual.largest(), residual.rms()})
@@ -168,7 +169,7 @@ std::string as_row(const Agreement& agreement, std::size_t name_width) {
 
 std::string as_text(const std::vector<Agreement>& list) {
     std::size_t name_width = 5;
-    for (const Agreement& agreement : list) name_width = std::max(name_width, agreement.scene.size());
+    for (const Agreement& agreement : list) name_width = std::max(name_width, shown(agreement.scene).size());
     std::string first(name_width + 16, ' ');
     std::string second = "scene" + std::string(name_width - 5, ' ') + "  points  solved";
     for (const Quantity& quantity : kQuantity) {
@@ -180,7 +181,7 @@ std::string as_text(const std::vector<Agreement>& list) {
     return text;
 }
 
-std::string as_json(const std::vector<Agreement>& list) {
+nlohmann::ordered_json as_json(const std::vector<Agreement>& list) {
     nlohmann::ordered_json json = nlohmann::ordered_json::array();
     for (const Agreement& agreement : list) {
         const bool geocentric = agreement.vertical == Vertical::kGeocentricRadius;
@@ -197,7 +198,7 @@ std::string as_json(const std::vector<Agreement>& list) {
         }
         json.push_back(entry);
     }
-    return json.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n";
+    return json;
 }
 
 int check_tiepoints(const TiepointsOptions& options) {
@@ -205,7 +206,7 @@ int check_tiepoints(const TiepointsOptions& options) {
         throw WrongUse("--points belongs to a single header");
     std::vector<Agreement> list;
     for (const std::string& header : options.headers) list.push_back(check_scene(header, options));
-    print(options.json ? as_json(list) : as_text(list));
+    options.json ? print_json(as_json(list)) : print(as_text(list));
     const bool all_solved =
         std::all_of(list.begin(), list.end(), [](const Agreement& a) { return a.unsolved == 0; });
     return all_solved ? kFine : kFindings;
