@@ -64,6 +64,7 @@ std::size_t format_bounded(char* to, std::size_t room, const char* format, ...) 
     const int error_before = errno;
     std::va_list arguments;
     va_start(arguments, format);
+    // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): the analyzer overlooks the line above
     const int wanted = std::vsnprintf(to, std::min<std::size_t>(room, INT_MAX), format, arguments);
     va_end(arguments);
 
