@@ -197,8 +197,8 @@ bool HeaderDocument::save(AtomicFile& file) {
     const XmlErrors errors;
     Sink sink{file};
     if (!sink.good()) return false;
-    // Saving, loading without blank text nodes and saving again is the documented way. It changes nothing unless
-    // there are texts beside elements: some of the blanks among them are dropped by loading.
+    // Saving, loading without blank text nodes and saving again is how headers are written. It changes nothing
+    // unless there are texts beside elements: some of the blanks among them are dropped by loading.
     const xmlNode* top = xmlDocGetRootElement(tree_.get());
     if (top && has_mixed_content(top)) {
         XmlTree again = reloaded(tree_.get());
