@@ -102,8 +102,8 @@ void inverse_kernel(benchmark::State& state) {
     const Scene& s = scene();
     quo::ImageTime seen{};
     each_sample(state, [&](std::size_t i) {
-        benchmark::DoNotOptimize(quo::image_time(s.segment(), s.ground[i], 2.0 * kSpacing, {0.0, 4.0 * kSpacing},
-                                                 kLambda, 0.0, &seen));
+        benchmark::DoNotOptimize(
+            quo::image_time(s.segment(), s.ground[i], 2.0 * kSpacing, {0.0, 4.0 * kSpacing}, kLambda, 0.0, &seen));
         benchmark::DoNotOptimize(seen);
     });
 }

@@ -50,12 +50,12 @@ QUO_BASE_API int gr_pt0(double P[3], const double S[3], const double V[3], doubl
  * @return 0, or the status of gr_pt0(), passed on with an ERROR_CALL_TREE entry.
  *
  * Range and Doppler leave a circle about the line of flight. Where it leaves the ellipsoid is found by Newton's
- * method in one unknown, the angle along the circle, at most 20 steps, and by a bracketed search near the nadir and
- * the horizon, where Newton's steps do not settle; this is gr_pt0()'s point, which meets all three equations where
- * omega is 0. Where it is not, the point's own velocity enters the Doppler equation, and Newton's method on the three
- * equations follows: at most 20 steps, done when a step is no longer than 1e-5 m or the squared steps no longer
- * shrink to less than half. Running out of those steps is no error: the last point is returned with 0, as good as
- * the starting point or better.
+ * method in one unknown, the angle along the circle, at most 20 steps, and by a bracketed search near the nadir
+ * and the horizon, where Newton's steps do not settle; this is gr_pt0()'s point, which meets all three equations
+ * where omega is 0. Where it is not, the point's own velocity enters the Doppler equation, and Newton's method on
+ * the three equations follows: at most 20 steps, done when a step is no longer than 1e-5 m or the squared steps no
+ * longer shrink to less than half. Running out of those steps is no error: the last point is returned with 0, as
+ * good as the starting point or better.
  */
 QUO_BASE_API int gr_pt(double P[3], const double S[3], const double V[3], double tau, double fd, double lambda,
                        double omega, double side, double a, double b) QUO_NOEXCEPT;

@@ -198,7 +198,8 @@ TEST_F(Tracked, FullTableFailsTheAllocationWithAnErrorEntry) {
 
 // ---- Against a plain model
 
-/** The simplest table that does the same: a list that is searched from the front, with all counters in every entry. */
+/** The simplest table that does the same: a list that is searched from the front, with all counters in every
+ * entry. */
 struct PlainTable {
     using Counters = std::array<std::uint16_t, 64>;
     struct Entry {

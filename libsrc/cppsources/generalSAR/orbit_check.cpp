@@ -63,8 +63,8 @@ SVFinding make_finding(SVFinding::Problem problem, std::int32_t index, double si
     return finding;
 }
 
-/** Time of flight from one vector to another, s, along the circle that the turn of the velocity belongs to; below 0
- * against the velocities, and not a number where they stand still. */
+/** Time of flight from one vector to another, s, along the circle that the turn of the velocity belongs to; below
+ * 0 against the velocities, and not a number where they stand still. */
 double flight_s(const StateVectors& states, std::int32_t from, std::int32_t to) noexcept {
     const Vec3 chord = position_of(states, to) - position_of(states, from);
     const Vec3 v0 = velocity_of(states, from), v1 = velocity_of(states, to);
@@ -127,9 +127,7 @@ private:
         double spacings;
 
         [[nodiscard]] bool whole() const { return std::abs(spacings - std::round(spacings)) < kNearlyWhole; }
-        [[nodiscard]] double missing() const {
-            return (whole() ? std::round(spacings) : spacings) - (to - from);
-        }
+        [[nodiscard]] double missing() const { return (whole() ? std::round(spacings) : spacings) - (to - from); }
     };
 
     /** All steps, counted in the one that most of the list takes, whatever the unit of its velocities. */

@@ -7,8 +7,8 @@
 
 namespace quo {
 
-/** State vectors, wherever they lie: count x 3 positions (m) and velocities (m/s). Their places are times after the
- * first vector, counted in spacings: increasing, and null for vectors that are equally spaced. */
+/** State vectors, wherever they lie: count x 3 positions (m) and velocities (m/s). Their places are times after
+ * the first vector, counted in spacings: increasing, and null for vectors that are equally spaced. */
 struct StateVectors {
     const double* positions;
     const double* velocities;
@@ -62,10 +62,10 @@ private:
 };
 
 /** How far a curve of degree 4 through each five vectors misses a smooth orbit where it is used: from 0.6 to 3.4
- * spacings after its first vector, and to the orbit's own ends, m, for equally spaced vectors. The miss is the next
- * term of Newton's interpolation formula, in the fifth difference of the positions. With five vectors the fourth
- * difference of the velocities stands for it: an inconsistency that changes smoothly from vector to vector, as
- * velocities of another frame or epoch have it, drops out there. */
+ * spacings after its first vector, and to the orbit's own ends, m, for equally spaced vectors. The miss is the
+ * next term of Newton's interpolation formula, in the fifth difference of the positions. With five vectors the
+ * fourth difference of the velocities stands for it: an inconsistency that changes smoothly from vector to vector,
+ * as velocities of another frame or epoch have it, drops out there. */
 double run_error_m(const StateVectors& states) noexcept;
 
 /** Length of the difference between a vector's velocity and the derivative of the polynomial through the positions

@@ -30,7 +30,7 @@ struct CallStack {
     std::uint64_t calls;  ///< serial of the latest call; never reset, so that serials stay unique
     RunningCall slots[kCallSlots];
     std::uint32_t muted;  ///< nothing is added to the report while this is above 0
-    int system_error;  ///< the latest that was reported, until somebody asks
+    int system_error;     ///< the latest that was reported, until somebody asks
 
     [[nodiscard]] std::uint32_t slot() const noexcept { return std::min(depth, kCallSlots - 1); }
     [[nodiscard]] RunningCall& running() noexcept { return slots[slot()]; }

@@ -279,8 +279,8 @@ struct ImageTime {
 };
 
 /** Time at which P is seen with Doppler fd, by Newton's method from `start_s`, and the range time before the last
- * step. 12 when an iterate but the last leaves the span or anything is not a number. Running out of steps is told in
- * the result alone.
+ * step. 12 when an iterate but the last leaves the span or anything is not a number. Running out of steps is told
+ * in the result alone.
  *
  * Targets seen close to either end need room beyond it: from the middle of a segment of 10 s spacing the first
  * iterate lands up to 0.1 s beside a solution at the end, at 60 s spacing up to 3 s. */

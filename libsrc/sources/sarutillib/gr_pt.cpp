@@ -89,8 +89,7 @@ extern "C" int inv_grpt_opt(double* t, double* tau, void* /*scratch*/, const dou
                             double fd) noexcept {
     CallFrame frame{"inv_grpt_opt", kSource};
     quo::ImageTime seen;
-    if (const int status =
-            quo::image_time({cx, cy, cz}, quo::load(P), 0.5 * span, {0.0, span}, lambda, fd, &seen))
+    if (const int status = quo::image_time({cx, cy, cz}, quo::load(P), 0.5 * span, {0.0, span}, lambda, fd, &seen))
         return frame.fail(status, "The point is not seen within the orbit segment");
     *t = seen.t_s;
     *tau = seen.tau_s;
