@@ -156,7 +156,7 @@ TEST(NumberClass, OfAFloatTakesTheLargestForInfinite) {
     for (const auto [bits, number_class] :
          {Pattern{0, 'f'}, Pattern{0x80000001, 'f'}, Pattern{0x40490FDB, 'f'}, Pattern{0x7F7FFFFE, 'f'},
           Pattern{0xFF7FFFFE, 'f'}, Pattern{0x7F800000, 'i'}, Pattern{0xFF800000, 'i'}, Pattern{0x7F7FFFFF, 'i'},
-          Pattern{0xFF7FFFFF, 'i'},  // deliberate
+          Pattern{0xFF7FFFFF, 'i'},  // the largest negative float, which counts as infinite
           Pattern{0x7F800001, 'n'}, Pattern{0xFFC00000, 'n'}, Pattern{0x7FFFFFFF, 'n'}})
         EXPECT_EQ(class_of(std::bit_cast<float>(bits)), number_class) << std::hex << bits;
 }

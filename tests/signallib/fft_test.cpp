@@ -17,7 +17,7 @@ using test::relative_error;
 using test::root;
 using test::Samples;
 
-/** The documented bound on a forward transform's error. */
+/** The bound that fft.h states for a forward transform's error. */
 double bound(int n) { return 2e-7 * std::max(1.0, std::log2(n)); }
 
 /** Splits off factors until a prime is left, whose transform is taken from the definition. In double precision. */

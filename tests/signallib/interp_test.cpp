@@ -248,7 +248,7 @@ TEST(Interp2, MeetsBandLimitedImagesWithinTheDocumentedError) {
                 0);
             const double error = relative_error(out, expected);
             EXPECT_LE(error, limit) << fraction;
-            EXPECT_GT(error, limit / 5.0) << "the documented error is far too large";
+            EXPECT_GT(error, limit / 5.0) << "the error that interp.h states is far too large";
         }
     }
 }
