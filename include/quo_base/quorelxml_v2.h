@@ -31,7 +31,7 @@
  * refused.
  *
  * Headers are read without network access, without entity substitution and without loading of DTDs; a document
- * that declares anything in a DTD of its own or nests deeper than 256 elements counts as no header. A text above
+ * that declares anything in a DTD of its own or nests deeper than 256 elements is not read. A text above
  * ten million bytes, names above ten million bytes in all, a file above 1 GiB and a real lack of memory give 7,
  * and the file is never replaced by a fresh document. Nor is one that is there but cannot be opened or read (no
  * rights, no free descriptor, a failing disk): a fresh document stands in for it in memory, and saving that
@@ -134,7 +134,8 @@ protected:
     /** The XPath expression of a channel, or of a field of it; for messages, not for evaluation. */
     static int setXpathExpression(int channel, std::string& expression);
     static int setXpathExpression(int channel, const char* field, std::string& expression);
-    /** The first element (the one at `index`, from 0) of a field, or null. The handle is libxml2's node. */
+    /** The first element (the one at `index`, from 0) of a field, or null. The handle can only be
+     * compared, and holds until the document changes. */
     void* getNode(int channel, const char* field) const;
     void* getNode(int channel, const char* field, int index) const;
     /** How many elements a field path leads to, and whether there are any, or that many; 0 and false without a
