@@ -184,8 +184,9 @@ void HeaderTree::remove(std::span<const Node> nodes) noexcept {
 
 void HeaderTree::drop_removed_children(Node parent) noexcept {
     Node kept = Node::none, first_kept = Node::none;
-    for (Node child = first(parent), after = child; child != Node::none; child = after) {
-        after = next(child);
+    Node after = Node::none;
+    for (Node child = first(parent); child != Node::none; child = after) {
+        after = next(child);  // before the child is linked to another
         if (record(child).removed) continue;
         (kept == Node::none ? first_kept : record(kept).next) = child;
         kept = child;
