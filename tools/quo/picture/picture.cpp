@@ -57,9 +57,7 @@ private:
 void write_png(const Picture& picture, const std::string& name) {
     PngWriter writer;
     if (!writer.encode(picture)) throw Failure(name + ": the picture cannot be encoded");
-    Output output{name};
-    output.write(writer.bytes());
-    output.commit();
+    write_output(name, writer.bytes());
 }
 
 }  // namespace tool

@@ -127,6 +127,11 @@ void read_description(const std::string& name, DataFile& raster) {
     }
 }
 
+void read_samples_description(const std::string& name, DataFile& raster) {
+    read_description(name, raster);
+    if (raster.NrOfLinesPerImage < 1 || raster.NrOfPixelsPerLine < 1) throw Failure(name + ": is empty");
+}
+
 std::string type_name(int cell_type) {
     return cell_type >= 0 && static_cast<std::size_t>(cell_type) < kNames.size()
                ? std::string{kNames[static_cast<std::size_t>(cell_type)]}

@@ -12,8 +12,10 @@
 
 namespace tool {
 
-/** Reads a raster's side file and makes sure that the raster is there and as long as described. Throws Failure. */
+/** Reads a raster's side file and makes sure that the raster is there and as long as that says. Throws Failure. */
 void read_description(const std::string& name, DataFile& raster);
+/** The same for a raster that must hold samples. */
+void read_samples_description(const std::string& name, DataFile& raster);
 
 /** Name of a cell type as in side files ("INT32_COMPLEX" for the one without a name there), or its number. */
 std::string type_name(int cell_type);

@@ -74,4 +74,10 @@ void Output::commit() {
     if (file_->in_place()) complain(name_ + ": written in place, no other file can be put there");
 }
 
+void write_output(const std::string& name, std::string_view text) {
+    Output output{name};
+    output.write(text);
+    output.commit();
+}
+
 }  // namespace tool

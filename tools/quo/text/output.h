@@ -41,6 +41,9 @@ private:
     std::string pending_;
 };
 
+/** Writes a whole result in one step. Throws Failure. */
+void write_output(const std::string& name, std::string_view text);
+
 }  // namespace tool
 
 #endif

@@ -79,11 +79,12 @@ std::string shown(std::string_view text) { return shown_except(text, ""); }
 
 std::string shown_lines(std::string_view text) { return shown_except(text, "\n\t"); }
 
-void print(std::string_view lines) {
-    Output output{"-"};
-    output.write(shown_lines(lines));
-    output.commit();
+std::string column(std::string text, std::size_t width) {
+    text.append(text.size() < width ? width - text.size() : 1, ' ');
+    return text;
 }
+
+void print(std::string_view lines) { write_output("-", shown_lines(lines)); }
 
 void print_json(const nlohmann::ordered_json& json, int indent) {
     print(json.dump(indent, ' ', false, nlohmann::ordered_json::error_handler_t::replace) + "\n");

@@ -16,6 +16,9 @@ std::string shown(std::string_view text);
 /** The same for lines that are complete: line feeds and tabs stay. */
 std::string shown_lines(std::string_view text);
 
+/** A text with blanks behind it up to a width, one at least, for lists of names and values. */
+std::string column(std::string text, std::size_t width);
+
 /** Writes lines to standard output, shown. Throws Failure where they do not arrive. */
 void print(std::string_view lines);
 /** Writes JSON, indented by `indent` (-1: on one line). What is escaped reads back as the same text. */

@@ -3,32 +3,38 @@
 
 #include <CLI/CLI.hpp>
 #include <functional>
+#include <memory>
 
 namespace tool {
 
-/** What the chosen subcommand does once the whole command line has been understood; returns the exit status. Every
- * add_... function declares one subcommand, which sets the job when it is chosen. */
+/** What the chosen verb does once the whole command line has been understood; returns the exit status. */
 using Job = std::function<int()>;
 
-void add_geolocate(CLI::App& app, Job& job);
-void add_orbit(CLI::App& app, Job& job);
-void add_time(CLI::App& app, Job& job);
-void add_tiepoints(CLI::App& app, Job& job);
-void add_info(CLI::App& app, Job& job);
-void add_validate(CLI::App& app, Job& job);
-void add_get(CLI::App& app, Job& job);
-void add_set(CLI::App& app, Job& job);
-void add_convert(CLI::App& app, Job& job);
-void add_quicklook(CLI::App& app, Job& job);
-void add_footprint(CLI::App& app, Job& job);
-void add_vrt(CLI::App& app, Job& job);
-void add_spectrum(CLI::App& app, Job& job);
-void add_resample(CLI::App& app, Job& job);
-void add_derive(CLI::App& app, Job& job);
-void add_fit(CLI::App& app, Job& job);
-void add_coregister(CLI::App& app, Job& job);
-void add_config(CLI::App& app, Job& job);
-void add_debug_dump(CLI::App& app, Job& job);
+/** Declares a verb, which sets the job when it is chosen. */
+using AddVerb = void(CLI::App& app, Job& job);
+AddVerb add_geolocate, add_orbit, add_time, add_tiepoints, add_info, add_validate, add_get, add_set, add_convert,
+    add_quicklook, add_footprint, add_vrt, add_spectrum, add_resample, add_derive, add_fit, add_coregister,
+    add_config, add_debug_dump;
+
+/** All of them, in the order in which the help lists them. */
+inline constexpr AddVerb* kVerbs[] = {add_geolocate, add_orbit,      add_time,     add_tiepoints, add_info,
+                                      add_validate,  add_get,        add_set,      add_convert,   add_quicklook,
+                                      add_footprint, add_vrt,        add_spectrum, add_resample,  add_derive,
+                                      add_fit,       add_coregister, add_config,   add_debug_dump};
+
+/** A verb that is being declared, and its options, which live as long as the verb. */
+template <typename Options>
+struct Verb {
+    CLI::App* command;
+    Options& options;
+};
+template <typename Options>
+Verb<Options> add_verb(CLI::App& app, Job& job, const char* name, const char* about, int (*run)(const Options&)) {
+    auto options = std::make_shared<Options>();
+    CLI::App* command = app.add_subcommand(name, about);
+    command->callback([options, run, &job] { job = [options, run] { return run(*options); }; });
+    return {command, *options};
+}
 
 }  // namespace tool
 

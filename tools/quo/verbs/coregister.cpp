@@ -1,6 +1,5 @@
 #include <array>
 #include <cmath>
-#include <memory>
 #include <nlohmann/json.hpp>
 #include <vector>
 
@@ -133,7 +132,7 @@ std::string as_text(const Agreement& agreement) {
     return text;
 }
 
-std::string as_json(const Agreement& agreement, const Coregist& mapping) {
+nlohmann::ordered_json as_json(const Agreement& agreement, const Coregist& mapping) {
     auto residuals = nlohmann::ordered_json::array();
     for (const Row& row : rows_of(agreement))
         residuals.push_back({{"direction", row.direction},
@@ -141,17 +140,16 @@ std::string as_json(const Agreement& agreement, const Coregist& mapping) {
                              {"unit", row.unit},
                              {"largest", row.residuals.largest()},
                              {"rms", row.residuals.rms()}});
-    const nlohmann::ordered_json json{{"points", agreement.range_samples.count()},
-                                      {"residuals", residuals},
-                                      {"trg0_s", mapping.trg0},
-                                      {"taz0_s", mapping.taz0},
-                                      {"RgFit", mapping.RgFit},
-                                      {"AzFit", mapping.AzFit},
-                                      {"Rg_Fit_Coeff", mapping.Rg_Fit_Coeff},
-                                      {"Az_Fit_Coeff", mapping.Az_Fit_Coeff},
-                                      {"Rg_Samples_Origin", mapping.Rg_Samples_Origin},
-                                      {"Az_Samples_Origin", mapping.Az_Samples_Origin}};
-    return json.dump(2) + "\n";
+    return {{"points", agreement.range_samples.count()},
+            {"residuals", residuals},
+            {"trg0_s", mapping.trg0},
+            {"taz0_s", mapping.taz0},
+            {"RgFit", mapping.RgFit},
+            {"AzFit", mapping.AzFit},
+            {"Rg_Fit_Coeff", mapping.Rg_Fit_Coeff},
+            {"Az_Fit_Coeff", mapping.Az_Fit_Coeff},
+            {"Rg_Samples_Origin", mapping.Rg_Samples_Origin},
+            {"Az_Samples_Origin", mapping.Az_Samples_Origin}};
 }
 
 void write_mapping(const std::string& file, Coregist& mapping) {
@@ -178,7 +176,7 @@ int coregister(const CoregisterOptions& options) {
         throw Failure("no sample form, status " + status_text(status));
     const Agreement agreement = judge(matches, mapping, master, slave);
     write_mapping(options.output, mapping);
-    print(options.json ? as_json(agreement, mapping) : as_text(agreement));
+    options.json ? print_json(as_json(agreement, mapping)) : print(as_text(agreement));
     return kFine;
 }
 
@@ -190,13 +188,12 @@ constexpr const char* kDetails =
 }  // namespace
 
 void add_coregister(CLI::App& app, Job& job) {
-    auto options = std::make_shared<CoregisterOptions>();
-    CLI::App* command = app.add_subcommand("coregister", kAbout)->footer(kDetails);
-    command->add_option("MASTER", options->master, "Header of the master image")->required();
-    command->add_option("SLAVE", options->slave, "Header of the slave image")->required();
-    command->add_option("-o,--output", options->output, "Header document to hold the section REGIST")->required();
-    command->add_flag("--json", options->json, "Print JSON");
-    command->callback([options, &job] { job = [options] { return coregister(*options); }; });
+    const auto [command, options] = add_verb(app, job, "coregister", kAbout, coregister);
+    command->footer(kDetails);
+    command->add_option("MASTER", options.master, "Header of the master image")->required();
+    command->add_option("SLAVE", options.slave, "Header of the slave image")->required();
+    command->add_option("-o,--output", options.output, "Header document to hold the section REGIST")->required();
+    command->add_flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

@@ -5,7 +5,6 @@
 #include <cstring>
 #include <filesystem>
 #include <fstream>
-#include <memory>
 #include <nlohmann/json.hpp>
 #include <string>
 #include <vector>
@@ -124,28 +123,26 @@ std::string text_of(const Dump& dump, const std::vector<Json>& values) {
         std::to_string(dump.first()) + "\nsecond dimension    " + std::to_string(dump.second()) + "\n";
     for (std::size_t i = 0; i < values.size(); ++i) {
         const auto second = static_cast<std::size_t>(dump.second());
-        const std::string place = std::to_string(i / second) + "," + std::to_string(i % second);
-        text += place + std::string(place.size() < 20 ? 20 - place.size() : 1, ' ') + text_of(values[i]) + "\n";
+        text +=
+            column(std::to_string(i / second) + "," + std::to_string(i % second), 20) + text_of(values[i]) + "\n";
     }
     return text;
 }
 
-std::string json_of(const Dump& dump, const std::vector<Json>& values) {
+Json json_of(const Dump& dump, const std::vector<Json>& values) {
     return Json{{"type_code", dump.type()},
                 {"element_bytes", dump.element_bytes()},
                 {"shown_as", kTypes[static_cast<std::size_t>(dump.type())]},
                 {"first", dump.first()},
                 {"second", dump.second()},
-                {"values", values}}
-               .dump(2) +
-           "\n";
+                {"values", values}};
 }
 
 int show_dump(const DumpOptions& options) {
     if (options.values < 0) throw WrongUse("--values " + std::to_string(options.values));
     Dump dump{options.file};
     const std::vector<Json> values = dump.read(options.values);
-    print(options.json ? json_of(dump, values) : text_of(dump, values));
+    options.json ? print_json(json_of(dump, values)) : print(text_of(dump, values));
     const std::string defect = dump.defect();
     if (defect.empty()) return kFine;
     complain(options.file + ": " + defect);
@@ -155,13 +152,11 @@ int show_dump(const DumpOptions& options) {
 }  // namespace
 
 void add_debug_dump(CLI::App& app, Job& job) {
-    auto options = std::make_shared<DumpOptions>();
-    CLI::App* command =
-        app.add_subcommand("debug-dump", "Prints the header words and the first values of a debug dump");
-    command->add_option("FILE", options->file, "Dump written by write_debug")->required();
-    command->add_option("--values", options->values, "How many values")->capture_default_str();
-    command->add_flag("--json", options->json, "Print JSON");
-    command->callback([options, &job] { job = [options] { return show_dump(*options); }; });
+    const auto [command, options] = add_verb(
+        app, job, "debug-dump", "Prints the header words and the first values of a debug dump", show_dump);
+    command->add_option("FILE", options.file, "Dump written by write_debug")->required();
+    command->add_option("--values", options.values, "How many values")->capture_default_str();
+    command->add_flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

@@ -215,7 +215,7 @@ std::string as_text(const Result& result) {
     return kept + text;
 }
 
-std::string as_json(const Result& result) {
+nlohmann::ordered_json as_json(const Result& result) {
     auto derived = nlohmann::ordered_json::array();
     auto kept = nlohmann::ordered_json::array();
     for (std::size_t q = 0; q < kQuantities; ++q) {
@@ -230,7 +230,7 @@ std::string as_json(const Result& result) {
                            {"taz0_s", p.taz0},
                            {"pol", p.pol}});
     }
-    return nlohmann::ordered_json{{"derived", derived}, {"kept", kept}}.dump(2) + "\n";
+    return {{"derived", derived}, {"kept", kept}};
 }
 
 int derive(const DeriveOptions& options) {
@@ -255,7 +255,7 @@ int derive(const DeriveOptions& options) {
         throw Failure(options.header + ": the region cannot be derived from, status " + status_text(status));
     const bool anything = std::find(result.wanted.begin(), result.wanted.end(), true) != result.wanted.end();
     if (anything) store(options.header, result, set);
-    print(options.json ? as_json(result) : as_text(result));
+    options.json ? print_json(as_json(result)) : print(as_text(result));
     return kFine;
 }
 
@@ -270,19 +270,18 @@ constexpr const char* kDetails =
 }  // namespace
 
 void add_derive(CLI::App& app, Job& job) {
-    auto options = std::make_shared<DeriveOptions>();
-    CLI::App* command = app.add_subcommand("derive", kAboutText)->footer(kDetails);
-    command->add_option("HEADER", options->header, "Product header, which is changed")->required();
+    const auto [command, options] = add_verb(app, job, "derive", kAboutText, derive);
+    command->footer(kDetails);
+    command->add_option("HEADER", options.header, "Product header, which is changed")->required();
     command
-        ->add_option("--region", options->region,
+        ->add_option("--region", options.region,
                      "Range start and length, azimuth start and length in s, else the header's section ROI")
         ->expected(4);
-    command->add_option("--what", options->what, "What to derive, else all that is missing")
+    command->add_option("--what", options.what, "What to derive, else all that is missing")
         ->check(CLI::IsMember({"fr", "angles", "ground"}));
-    command->add_flag("--grid", options->in_both_times, "Angles and ground range in both times");
-    command->add_flag("--replace", options->replace, "Also replace polynomials that are there");
-    command->add_flag("--json", options->json, "Print JSON");
-    command->callback([options, &job] { job = [options] { return derive(*options); }; });
+    command->add_flag("--grid", options.in_both_times, "Angles and ground range in both times");
+    command->add_flag("--replace", options.replace, "Also replace polynomials that are there");
+    command->add_flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

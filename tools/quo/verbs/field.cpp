@@ -1,6 +1,5 @@
 #include <cmath>
 #include <cstdint>
-#include <memory>
 #include <nlohmann/json.hpp>
 #include <optional>
 #include <string>
@@ -126,28 +125,28 @@ int set_field(const FieldOptions& options) {
     return kFine;
 }
 
-CLI::App* add_common(CLI::App& app, const char* name, const char* about, FieldOptions& options) {
-    CLI::App* command = app.add_subcommand(name, about);
-    command->add_option("HEADER", options.header, "XML header file")->required();
-    command->add_option("FIELD", options.field, "Section/Field, such as SamplingConstants/prf_hz")->required();
-    return command;
+Verb<FieldOptions> add_field_verb(CLI::App& app, Job& job, const char* name, const char* about,
+                                  int (*run)(const FieldOptions&)) {
+    const auto verb = add_verb(app, job, name, about, run);
+    verb.command->add_option("HEADER", verb.options.header, "XML header file")->required();
+    verb.command->add_option("FIELD", verb.options.field, "Section/Field, such as SamplingConstants/prf_hz")
+        ->required();
+    return verb;
 }
 
 }  // namespace
 
 void add_get(CLI::App& app, Job& job) {
-    auto options = std::make_shared<FieldOptions>();
-    CLI::App* command = add_common(app, "get", "Prints one field of a header, a line for each value", *options);
-    command->add_flag("--json", options->json, "Print JSON");
-    command->callback([options, &job] { job = [options] { return get_field(*options); }; });
+    const auto [command, options] =
+        add_field_verb(app, job, "get", "Prints one field of a header, a line for each value", get_field);
+    command->add_flag("--json", options.json, "Print JSON");
 }
 
 void add_set(CLI::App& app, Job& job) {
-    auto options = std::make_shared<FieldOptions>();
-    CLI::App* command = add_common(app, "set", "Changes one field of a header; everything else stays", *options);
-    command->add_option("VALUE", options->values, "The value, or the values of an array")->required();
-    command->add_flag("--create", options->create, "Make the field where it is missing");
-    command->callback([options, &job] { job = [options] { return set_field(*options); }; });
+    const auto [command, options] =
+        add_field_verb(app, job, "set", "Changes one field of a header; everything else stays", set_field);
+    command->add_option("VALUE", options.values, "The value, or the values of an array")->required();
+    command->add_flag("--create", options.create, "Make the field where it is missing");
 }
 
 }  // namespace tool

@@ -1,7 +1,6 @@
 #include <algorithm>
 #include <cmath>
 #include <limits>
-#include <memory>
 #include <nlohmann/json.hpp>
 #include <vector>
 
@@ -110,21 +109,20 @@ std::string as_text(const Points& points, const Fit& fit) {
     return text;
 }
 
-std::string as_json(const Points& points, const Fit& fit) {
-    const nlohmann::ordered_json json{{"x", points.x_name},
-                                      {"y", points.y_name},
-                                      {"points", points.x.size()},
-                                      {"degree", fit.degree()},
-                                      {"centre", fit.centre},
-                                      {"scale", fit.scale},
-                                      {"coefficients_of_u", fit.coefficients},
-                                      {"coefficients_of_x", in_powers_of_x(fit)},
-                                      {"rank", fit.summary.rank},
-                                      {"condition", fit.summary.condition},
-                                      {"residual_norm", fit.summary.residual_norm},
-                                      {"residual_rms", fit.residuals.rms()},
-                                      {"residual_largest", fit.residuals.largest()}};
-    return json.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n";
+nlohmann::ordered_json as_json(const Points& points, const Fit& fit) {
+    return {{"x", points.x_name},
+            {"y", points.y_name},
+            {"points", points.x.size()},
+            {"degree", fit.degree()},
+            {"centre", fit.centre},
+            {"scale", fit.scale},
+            {"coefficients_of_u", fit.coefficients},
+            {"coefficients_of_x", in_powers_of_x(fit)},
+            {"rank", fit.summary.rank},
+            {"condition", fit.summary.condition},
+            {"residual_norm", fit.summary.residual_norm},
+            {"residual_rms", fit.residuals.rms()},
+            {"residual_largest", fit.residuals.largest()}};
 }
 
 int fit_table(const FitOptions& options) {
@@ -133,7 +131,7 @@ int fit_table(const FitOptions& options) {
         throw Failure(std::to_string(points.x.size()) + " points do not determine degree " +
                       std::to_string(options.degree));
     const Fit fit = fit_points(points, options.degree);
-    print(options.json ? as_json(points, fit) : as_text(points, fit));
+    options.json ? print_json(as_json(points, fit)) : print(as_text(points, fit));
     if (fit.summary.rank > options.degree) return kFine;
     complain("the points determine only " + std::to_string(fit.summary.rank) + " of " +
              std::to_string(options.degree + 1) + " coefficients; the others are 0");
@@ -149,16 +147,15 @@ constexpr const char* kDetails =
 }  // namespace
 
 void add_fit(CLI::App& app, Job& job) {
-    auto options = std::make_shared<FitOptions>();
-    CLI::App* command = app.add_subcommand("fit", kAbout)->footer(kDetails);
-    command->add_option("--degree", options->degree, "Degree of the polynomial")
+    const auto [command, options] = add_verb(app, job, "fit", kAbout, fit_table);
+    command->footer(kDetails);
+    command->add_option("--degree", options.degree, "Degree of the polynomial")
         ->required()
         ->check(CLI::Range(0, kHighestDegree));
-    command->add_option("--input", options->input, "Table to read, - for standard input")->capture_default_str();
-    command->add_option("--x", options->x, "Column of the abscissa, else the first");
-    command->add_option("--y", options->y, "Column of the ordinate, else the second");
-    command->add_flag("--json", options->json, "Print JSON");
-    command->callback([options, &job] { job = [options] { return fit_table(*options); }; });
+    command->add_option("--input", options.input, "Table to read, - for standard input")->capture_default_str();
+    command->add_option("--x", options.x, "Column of the abscissa, else the first");
+    command->add_option("--y", options.y, "Column of the ordinate, else the second");
+    command->add_flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

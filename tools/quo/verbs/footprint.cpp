@@ -1,6 +1,5 @@
 #include <algorithm>
 #include <cmath>
-#include <memory>
 #include <nlohmann/json.hpp>
 #include <vector>
 
@@ -93,10 +92,9 @@ int footprint(const std::string& header) {
 }  // namespace
 
 void add_footprint(CLI::App& app, Job& job) {
-    auto header = std::make_shared<std::string>();
-    CLI::App* command = app.add_subcommand("footprint", "Prints a product's outline as GeoJSON");
-    command->add_option("HEADER", *header, "Product header")->required();
-    command->callback([header, &job] { job = [header] { return footprint(*header); }; });
+    const auto [command, header] =
+        add_verb(app, job, "footprint", "Prints a product's outline as GeoJSON", footprint);
+    command->add_option("HEADER", header, "Product header")->required();
 }
 
 }  // namespace tool

@@ -1,7 +1,6 @@
 #include <algorithm>
 #include <array>
 #include <limits>
-#include <memory>
 #include <optional>
 #include <span>
 
@@ -255,22 +254,21 @@ constexpr const char* kDetails =
 }  // namespace
 
 void add_geolocate(CLI::App& app, Job& job) {
-    auto options = std::make_shared<GeolocateOptions>();
-    CLI::App* command = app.add_subcommand("geolocate", kAbout)->footer(kDetails);
-    command->add_option("HEADER", options->header, "Product header with the orbit")->required();
-    command->add_option("--to", options->direction, "Which way")
+    const auto [command, options] = add_verb(app, job, "geolocate", kAbout, geolocate);
+    command->footer(kDetails);
+    command->add_option("HEADER", options.header, "Product header with the orbit")->required();
+    command->add_option("--to", options.direction, "Which way")
         ->required()
         ->check(CLI::IsMember({"ground", "radar"}));
-    command->add_option("--input", options->input, "Table to read, - for standard input")->capture_default_str();
-    command->add_option("--output", options->output, "Table to write, - for standard output")
+    command->add_option("--input", options.input, "Table to read, - for standard input")->capture_default_str();
+    command->add_option("--output", options.output, "Table to write, - for standard output")
         ->capture_default_str();
-    command->add_flag("--precise", options->precise, "First guess on the polynomial through the whole orbit");
-    command->add_option("--wavelength", options->wavelength_m, "Wavelength in m, instead of the header's");
-    command->add_option("--look", options->look, "Look side, instead of the header's")
+    command->add_flag("--precise", options.precise, "First guess on the polynomial through the whole orbit");
+    command->add_option("--wavelength", options.wavelength_m, "Wavelength in m, instead of the header's");
+    command->add_option("--look", options.look, "Look side, instead of the header's")
         ->check(CLI::IsMember({"right", "left"}));
-    command->add_option("--resample", options->resample_s, "State vectors at most so many seconds apart");
-    add_waitbar_option(*command, options->waitbar);
-    command->callback([options, &job] { job = [options] { return geolocate(*options); }; });
+    command->add_option("--resample", options.resample_s, "State vectors at most so many seconds apart");
+    add_waitbar_option(*command, options.waitbar);
 }
 
 }  // namespace tool

@@ -1,4 +1,3 @@
-#include <memory>
 #include <nlohmann/json.hpp>
 #include <string_view>
 #include <vector>
@@ -39,10 +38,7 @@ public:
     [[nodiscard]] std::string text() const {
         constexpr std::size_t kColumn = 20;
         std::string text;
-        for (const auto& [name, value] : rows_) {
-            text += name;
-            text.append(name.size() < kColumn ? kColumn - name.size() : 1, ' ').append(value) += '\n';
-        }
+        for (const auto& [name, value] : rows_) text += column(name, kColumn) + value + "\n";
         return text;
     }
     [[nodiscard]] const nlohmann::ordered_json& json() const { return json_; }
@@ -138,11 +134,16 @@ void add_objects(Facts& facts, const GeneralSAR& product) {
     }
 }
 
-int show_info(const std::string& header, bool json) {
+struct InfoOptions {
+    std::string header;
+    bool json = false;
+};
+
+int show_info(const InfoOptions& options) {
     GeneralSAR product;
-    read_product(header, product);
+    read_product(options.header, product);
     Facts facts;
-    facts.add_text("header", "header", header);
+    facts.add_text("header", "header", options.header);
     if (product.GSexists(gsDataSetInfo)) add_data_set(facts, product.dataSetInfo);
     if (product.GSexists(gsRoi)) add_region(facts, product.roi.Roi);
     if (product.GSexists(gsOrbit)) add_orbit(facts, product.orbit);
@@ -150,22 +151,16 @@ int show_info(const std::string& header, bool json) {
     if (product.GSexists(gsSamplingConstants)) add_sampling(facts, product.samplingConstants);
     add_corners(facts, product);
     add_objects(facts, product);
-    json ? print_json(facts.json()) : print(facts.text());
+    options.json ? print_json(facts.json()) : print(facts.text());
     return kFine;
 }
 
 }  // namespace
 
 void add_info(CLI::App& app, Job& job) {
-    struct Options {
-        std::string header;
-        bool json = false;
-    };
-    auto options = std::make_shared<Options>();
-    CLI::App* command = app.add_subcommand("info", "What a product is: one screen");
-    command->add_option("HEADER", options->header, "Product header")->required();
-    command->add_flag("--json", options->json, "Print JSON");
-    command->callback([options, &job] { job = [options] { return show_info(options->header, options->json); }; });
+    const auto [command, options] = add_verb(app, job, "info", "What a product is: one screen", show_info);
+    command->add_option("HEADER", options.header, "Product header")->required();
+    command->add_flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

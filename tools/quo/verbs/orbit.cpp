@@ -1,5 +1,4 @@
 #include <cmath>
-#include <memory>
 #include <nlohmann/json.hpp>
 #include <optional>
 
@@ -124,10 +123,7 @@ std::string as_text(Scene& scene, const std::vector<std::string>& findings) {
 
     constexpr std::size_t kWidth = 15;
     std::string text;
-    for (const auto& [name, value] : facts) {
-        text += name;
-        text.append(kWidth - name.size(), ' ').append(value) += '\n';
-    }
+    for (const auto& [name, value] : facts) text += column(name, kWidth) + value + "\n";
     return text;
 }
 
@@ -169,16 +165,14 @@ int show_orbit(const OrbitOptions& options) {
 }  // namespace
 
 void add_orbit(CLI::App& app, Job& job) {
-    auto options = std::make_shared<OrbitOptions>();
-    CLI::App* command = app.add_subcommand(
-        "orbit", "Shows a header's orbit, what is wrong with it, and position and velocity at chosen times");
-    command->add_option("HEADER", options->header, "Product header with the orbit")->required();
-    CLI::Option* at = command->add_option("--at", options->at, "Time: seconds since 1985, or a date text");
-    command
-        ->add_option("--every", options->every_s, "From the first state vector to the last, in steps of seconds")
+    const auto [command, options] = add_verb(
+        app, job, "orbit",
+        "Shows a header's orbit, what is wrong with it, and position and velocity at chosen times", show_orbit);
+    command->add_option("HEADER", options.header, "Product header with the orbit")->required();
+    CLI::Option* at = command->add_option("--at", options.at, "Time: seconds since 1985, or a date text");
+    command->add_option("--every", options.every_s, "From the first state vector to the last, in steps of seconds")
         ->excludes(at);
-    command->add_flag("--json", options->json, "Print JSON");
-    command->callback([options, &job] { job = [options] { return show_orbit(*options); }; });
+    command->add_flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

@@ -2,7 +2,6 @@
 #include <cmath>
 #include <complex>
 #include <limits>
-#include <memory>
 #include <vector>
 
 #include "apart.h"
@@ -160,8 +159,7 @@ int quicklook(const QuicklookOptions& options) {
     require_apart(raster_files(options.raster), {options.picture});
     if (options.width < 1) throw WrongUse("--width " + std::to_string(options.width));
     DataFile raster;
-    read_description(options.raster, raster);
-    if (raster.NrOfLinesPerImage < 1 || raster.NrOfPixelsPerLine < 1) throw Failure(options.raster + ": is empty");
+    read_samples_description(options.raster, raster);
     note_interrupts();
     Multilook multilook{raster, options.raster, looks_of(options, raster)};
     multilook.run(options.waitbar);
@@ -181,17 +179,16 @@ int quicklook(const QuicklookOptions& options) {
 }  // namespace
 
 void add_quicklook(CLI::App& app, Job& job) {
-    auto options = std::make_shared<QuicklookOptions>();
-    CLI::App* command = app.add_subcommand("quicklook", "Shows a raster as a picture: power in dB, multilooked");
-    command->add_option("RASTER", options->raster, "Raster with a side file RASTER.hdr")->required();
-    command->add_option("OUT", options->picture, "Picture to write (PNG)")->required();
+    const auto [command, options] =
+        add_verb(app, job, "quicklook", "Shows a raster as a picture: power in dB, multilooked", quicklook);
+    command->add_option("RASTER", options.raster, "Raster with a side file RASTER.hdr")->required();
+    command->add_option("OUT", options.picture, "Picture to write (PNG)")->required();
     CLI::Option* looks =
-        command->add_option("--looks", options->looks, "Lines x samples averaged into a pixel, such as 4x1");
-    command->add_option("--db", options->db, "Black and white: MIN:MAX in dB, or auto (2nd to 98th percentile)");
-    command->add_option("--width", options->width, "Greatest width in pixels, in place of --looks (1000)")
+        command->add_option("--looks", options.looks, "Lines x samples averaged into a pixel, such as 4x1");
+    command->add_option("--db", options.db, "Black and white: MIN:MAX in dB, or auto (2nd to 98th percentile)");
+    command->add_option("--width", options.width, "Greatest width in pixels, in place of --looks (1000)")
         ->excludes(looks);
-    add_waitbar_option(*command, options->waitbar);
-    command->callback([options, &job] { job = [options] { return quicklook(*options); }; });
+    add_waitbar_option(*command, options.waitbar);
 }
 
 }  // namespace tool

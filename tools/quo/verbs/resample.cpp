@@ -1,7 +1,6 @@
 #include <algorithm>
 #include <climits>
 #include <complex>
-#include <memory>
 #include <numbers>
 #include <optional>
 #include <vector>
@@ -227,9 +226,7 @@ std::string defect_of_centre(const std::string& text) {
 int resample(const ResampleOptions& options) {
     require_raster_apart(options.in, options.out);
     DataFile description;
-    read_description(options.in, description);
-    if (description.NrOfLinesPerImage < 1 || description.NrOfPixelsPerLine < 1)
-        throw Failure(options.in + ": is empty");
+    read_samples_description(options.in, description);
     if (options.centre != 0.0 && description.is_complex() == 0)
         throw WrongUse("--centre: samples that are real have a band around 0");
     note_interrupts();
@@ -240,18 +237,16 @@ int resample(const ResampleOptions& options) {
 }  // namespace
 
 void add_resample(CLI::App& app, Job& job) {
-    auto options = std::make_shared<ResampleOptions>();
-    CLI::App* command =
-        app.add_subcommand("resample", "Changes the number of samples or lines of a raster of any size");
-    command->add_option("IN", options->in, "Raster with a side file IN.hdr")->required();
-    command->add_option("OUT", options->out, "Raster to write, with a side file OUT.hdr")->required();
+    const auto [command, options] =
+        add_verb(app, job, "resample", "Changes the number of samples or lines of a raster of any size", resample);
+    command->add_option("IN", options.in, "Raster with a side file IN.hdr")->required();
+    command->add_option("OUT", options.out, "Raster to write, with a side file OUT.hdr")->required();
     CLI::App* size = command->add_option_group("New size")->require_option(1);
-    size->add_option("--samples", options->samples, "Samples per line")->check(CLI::Range(1, INT_MAX));
-    size->add_option("--lines", options->lines, "Lines")->check(CLI::Range(1, INT_MAX));
-    command->add_option("--centre", options->centre, "Centre of the band in cycles per sample, where it is not 0")
+    size->add_option("--samples", options.samples, "Samples per line")->check(CLI::Range(1, INT_MAX));
+    size->add_option("--lines", options.lines, "Lines")->check(CLI::Range(1, INT_MAX));
+    command->add_option("--centre", options.centre, "Centre of the band in cycles per sample, where it is not 0")
         ->check(defect_of_centre);
-    add_waitbar_option(*command, options->waitbar);
-    command->callback([options, &job] { job = [options] { return resample(*options); }; });
+    add_waitbar_option(*command, options.waitbar);
 }
 
 }  // namespace tool

@@ -2,7 +2,6 @@
 #include <cmath>
 #include <complex>
 #include <limits>
-#include <memory>
 #include <nlohmann/json.hpp>
 #include <numbers>
 #include <vector>
@@ -179,8 +178,7 @@ int spectrum(const SpectrumOptions& options) {
     require_apart(read, {options.picture});
     const Rates rates = rates_of(options.header);
     DataFile raster;
-    read_description(options.raster, raster);
-    if (raster.NrOfLinesPerImage < 1 || raster.NrOfPixelsPerLine < 1) throw Failure(options.raster + ": is empty");
+    read_samples_description(options.raster, raster);
     note_interrupts();
     Spectra spectra{options.raster, raster};
     spectra.run(options.waitbar);
@@ -213,15 +211,13 @@ int spectrum(const SpectrumOptions& options) {
 }  // namespace
 
 void add_spectrum(CLI::App& app, Job& job) {
-    auto options = std::make_shared<SpectrumOptions>();
-    CLI::App* command =
-        app.add_subcommand("spectrum", "Range and azimuth power spectra of a raster, and what they tell");
-    command->add_option("RASTER", options->raster, "Raster with a side file RASTER.hdr")->required();
-    command->add_option("OUT", options->picture, "Plot to write (PNG)")->required();
-    command->add_option("--header", options->header, "Header with the sampling rates, for frequencies in Hz");
-    command->add_flag("--json", options->json, "Print JSON");
-    add_waitbar_option(*command, options->waitbar);
-    command->callback([options, &job] { job = [options] { return spectrum(*options); }; });
+    const auto [command, options] = add_verb(
+        app, job, "spectrum", "Range and azimuth power spectra of a raster, and what they tell", spectrum);
+    command->add_option("RASTER", options.raster, "Raster with a side file RASTER.hdr")->required();
+    command->add_option("OUT", options.picture, "Plot to write (PNG)")->required();
+    command->add_option("--header", options.header, "Header with the sampling rates, for frequencies in Hz");
+    command->add_flag("--json", options.json, "Print JSON");
+    add_waitbar_option(*command, options.waitbar);
 }
 
 }  // namespace tool

@@ -1,4 +1,3 @@
-#include <memory>
 #include <nlohmann/json.hpp>
 
 #include "commands.h"
@@ -36,12 +35,11 @@ int convert_times(const TimeOptions& options) {
 }  // namespace
 
 void add_time(CLI::App& app, Job& job) {
-    auto options = std::make_shared<TimeOptions>();
-    CLI::App* command = app.add_subcommand("time", "Seconds since 1985 to date texts, and back");
-    command->add_option("TIME", options->times, "Seconds, or a date such as \"04-JAN-2022 17:05:58.5\"")
+    const auto [command, options] =
+        add_verb(app, job, "time", "Seconds since 1985 to date texts, and back", convert_times);
+    command->add_option("TIME", options.times, "Seconds, or a date such as \"04-JAN-2022 17:05:58.5\"")
         ->required();
-    command->add_flag("--json", options->json, "Print JSON");
-    command->callback([options, &job] { job = [options] { return convert_times(*options); }; });
+    command->add_flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

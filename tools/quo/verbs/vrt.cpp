@@ -1,6 +1,5 @@
 #include <array>
 #include <filesystem>
-#include <memory>
 #include <string_view>
 
 #include "apart.h"
@@ -67,19 +66,16 @@ int write_vrt(const std::string& name) {
     read_description(name, raster);
     if (raster.CellType == INT8_COMPLEX) throw Failure(name + ": GDAL has no type for INT8_COMPLEX");
     require_apart(raster_files(name), {name + ".vrt"});
-    Output output{name + ".vrt"};
-    output.write(vrt_text(raster, std::filesystem::path{name}.filename().string()));
-    output.commit();
+    write_output(name + ".vrt", vrt_text(raster, std::filesystem::path{name}.filename().string()));
     return kFine;
 }
 
 }  // namespace
 
 void add_vrt(CLI::App& app, Job& job) {
-    auto name = std::make_shared<std::string>();
-    CLI::App* command = app.add_subcommand("vrt", "Writes RASTER.vrt beside a raster, which GDAL opens");
-    command->add_option("RASTER", *name, "Raster with a side file RASTER.hdr")->required();
-    command->callback([name, &job] { job = [name] { return write_vrt(*name); }; });
+    const auto [command, name] =
+        add_verb(app, job, "vrt", "Writes RASTER.vrt beside a raster, which GDAL opens", write_vrt);
+    command->add_option("RASTER", name, "Raster with a side file RASTER.hdr")->required();
 }
 
 }  // namespace tool
