@@ -51,6 +51,7 @@ private:
     void start(const std::string& program, std::vector<std::string> arguments, const std::string& errors) {
         arguments.insert(arguments.begin(), program);
         std::vector<char*> pointers;
+        pointers.reserve(arguments.size() + 1);
         for (std::string& argument : arguments) pointers.push_back(argument.data());
         pointers.push_back(nullptr);
         posix_spawn_file_actions_t actions;
