@@ -42,12 +42,8 @@ std::ostream& operator<<(std::ostream& out, const Acquisition& acquisition) { re
 constexpr Acquisition kAcquisitions[] = {
     {"RightZeroDoppler", 0, +1, 1167930370.3, 0.0055231, 517.3, 411.7, 0, 0, 0.0, 0.0, SHORT_COMPLEX, true, 17,
      3.0, 61.7},
-    {"RightSquintedForward", 1, +1, 1133090050.7, 0.0056817, 517.3, 411.7, 0, 0, 1.0, 3.1e6, FLOAT_COMPLEX, true,
-     0, 0.0, 0.0},
-    {"LeftZeroDoppler", 1, -1, 1133090050.7, 0.0056817, 517.3, 411.7, 0, 0, 0.0, 0.0, FLOAT_COMPLEX, false, 3, 0.0,
-     0.0},
-    {"LeftSquintedBackward", 0, -1, 1167930370.3, 0.0055231, 517.3, 411.7, 0, 0, -1.0, -2.7e6, SHORT_COMPLEX,
-     false, 0, 3.0, 0.0},
+    {"LeftSquintedBackward", 0, -1, 1167930370.3, 0.0055231, 517.3, 411.7, 0, 0, -1.0, -2.7e6, FLOAT_COMPLEX, true,
+     3, 3.0, 0.0},
     {"AirborneLeftSquinted", 2, -1, 869150210.3, 1.013e-4, 131.3, 107.9, 103.7, 81.3, 0.37, 0.0, FLOAT_COMPLEX,
      false, 0, 0.0, 0.0},
 };

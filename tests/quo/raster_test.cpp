@@ -15,9 +15,6 @@
 
 namespace {
 
-using testing::HasSubstr;
-using testing::IsEmpty;
-
 using RasterVerbs = test::RasterFolder;
 
 TEST_F(RasterVerbs, ConvertCutsAndConverts) {
@@ -25,7 +22,7 @@ TEST_F(RasterVerbs, ConvertCutsAndConverts) {
     const test::Finished finished = test::quo(
         {"convert", in, out, "--type", "float_complex", "--order", "l", "--lines", "5:25", "--samples", ":11"});
     ASSERT_EQ(finished.exit_status, 0) << finished.err;
-    EXPECT_THAT(finished.err, IsEmpty());
+    EXPECT_EQ(finished.err, "");
     DataFile read;
     ASSERT_EQ(read.read_hdr(out.c_str()), 0);
     EXPECT_EQ(read.NrOfLinesPerImage, 20);
@@ -46,78 +43,27 @@ TEST_F(RasterVerbs, ConvertCutsAndConverts) {
     EXPECT_TRUE(test::read_text(out) == expected);
 }
 
-// Whatever the two types, the values arrive; prefixes are dropped.
-TEST_F(RasterVerbs, ConvertKnowsEveryPairOfTypes) {
+// The tool itself widens and narrows samples of 8 bits; the other types are the library's. Prefixes are dropped.
+TEST_F(RasterVerbs, ConvertKnowsSamplesOfEightBits) {
     constexpr const char* kNames[] = {"FLOAT_COMPLEX", "FLOAT32", "DOUBLE_COMPLEX", "FLOAT64",
                                       "INT32_COMPLEX", "INT32",   "SHORT_COMPLEX",  "INT16",
                                       "INT8_COMPLEX",  "INT8"};
-    for (int from = 0; from <= 9; ++from) {
-        const std::string in = make("in.raw", 3, 5, from, 1, 2);
-        for (int to = 0; to <= 9; ++to) {
-            SCOPED_TRACE(std::to_string(from) + " to " + std::to_string(to));
-            const std::string out = file("out.raw");
-            const test::Finished finished =
-                test::quo({"convert", in, out, "--type", kNames[to], "--prefix", "drop", "--order", "m"});
-            const bool possible =
-                from % 2 == 1 || to % 2 == 0;  // real samples become complex ones, not the reverse
-            ASSERT_EQ(finished.exit_status, possible ? 0 : 2) << finished.err;
-            if (!possible) continue;
-            std::string expected;
-            for (int i = 0; i < 15; ++i) {
-                for (int part = 0; part < (to % 2 == 0 ? 2 : 1); ++part) {
-                    const bool zero = part == 1 && from % 2 == 1;
-                    test::append_part(expected, to, zero ? 0.0 : test::part_value(i / 5, i % 5, part), true);
-                }
+    for (int pair = 0; pair < 100; ++pair) {
+        const int from = pair / 10, to = pair % 10;
+        if ((from < INT8_COMPLEX && to < INT8_COMPLEX) || (from % 2 == 0 && to % 2 == 1)) continue;
+        SCOPED_TRACE(std::string{kNames[from]} + " to " + kNames[to]);
+        const std::string in = make("in.raw", 3, 5, from, 1, 2), out = file("out.raw");
+        const test::Finished finished =
+            test::quo({"convert", in, out, "--type", kNames[to], "--prefix", "drop", "--order", "m"});
+        ASSERT_EQ(finished.exit_status, 0) << finished.err;
+        std::string expected;
+        for (int i = 0; i < 15; ++i) {
+            for (int part = 0; part <= 1 - to % 2; ++part) {
+                const bool zero = part == 1 && from % 2 == 1;
+                test::append_part(expected, to, zero ? 0.0 : test::part_value(i / 5, i % 5, part), true);
             }
-            EXPECT_TRUE(test::read_text(out) == expected);
         }
-    }
-}
-
-struct BadRaster {
-    const char* name;
-    std::vector<std::string> arguments;  // IN and OUT stand for the files
-    int exit_status;
-    const char* message;
-};
-TEST_F(RasterVerbs, RefusalsNameFileAndCauseAndLeaveNothing) {
-    const std::string in = make("in.raw", 4, 5, INT16, 0), short_one = make("short.raw", 4, 5, INT16, 0);
-    std::filesystem::resize_file(short_one, 39);
-    make("bad.raw", 4, 5, INT16, 0);
-    test::write_text(file("bad.raw.hdr"), "[RasterInfo]\nCellType = INT99\n");
-    const std::size_t before = files().size();
-    const std::vector<BadRaster> rows = {
-        {"Missing", {"convert", file("none.raw"), "OUT"}, 1, "none.raw"},
-        {"TooShort", {"convert", short_one, "OUT"}, 1, "has 39 bytes, its description needs 40"},
-        {"BadHeader", {"convert", file("bad.raw"), "OUT"}, 1, "no complete description"},
-        {"BadLines", {"convert", in, "OUT", "--lines", "3:9"}, 2, "no part of 0:4"},
-        {"BadType", {"convert", in, "OUT", "--type", "INT99"}, 2, "INT99"},
-        // Of a name that the system does not even look up nothing is known, least of all that it is no regular
-        // file.
-        {"EndlessName", {"convert", in, file(std::string(300, 'x'))}, 1, "x: File name too long"},
-        {"FolderAsTarget", {"convert", in, folder_.path().string()}, 1, "no regular file"},
-        {"NoSuchFolder",
-         {"convert", in, file("no/out.raw")},
-         1,
-         "cannot be created with its side file: No such file"},
-        {"StandardOutput", {"convert", in, "-"}, 2, "needs a side file"},
-        {"NoScale", {"convert", in, "OUT", "--scale", "0"}, 2, "--scale 0"},
-        {"NoOffset", {"convert", in, "OUT", "--offset", "nan"}, 2, "--offset nan: no finite number"},
-        {"Looks", {"quicklook", in, "OUT", "--looks", "0x3"}, 2, "--looks"},
-        {"Decibels", {"quicklook", in, "OUT", "--db", "5:1"}, 2, "--db"},
-        {"VrtOfNothing", {"vrt", file("none.raw")}, 1, "none.raw"},
-    };
-    for (const BadRaster& row : rows) {
-        SCOPED_TRACE(row.name);
-        std::vector<std::string> arguments = row.arguments;
-        for (std::string& argument : arguments) {
-            if (argument == "OUT") argument = file("out.raw");
-        }
-        const test::Finished finished = test::quo(arguments);
-        EXPECT_EQ(finished.exit_status, row.exit_status);
-        ASSERT_EQ(finished.messages().size(), 1U) << finished.err;
-        EXPECT_THAT(finished.err, HasSubstr(row.message));
-        EXPECT_EQ(files().size(), before) << "nothing is left behind";
+        EXPECT_TRUE(test::read_text(out) == expected);
     }
 }
 
@@ -186,28 +132,6 @@ TEST_F(RasterVerbs, ConvertScalesInDoublePrecision) {
     }
 }
 
-// What the side file of a raster says besides its layout outlives a conversion of the raster onto itself; so do
-// its permissions and the links that lead to it. Once, 0600 became 0644.
-TEST_F(RasterVerbs, ConvertInPlaceKeepsTheHeader) {
-    const std::string in = make("in.raw", 3, 4, INT16, 0);
-    ASSERT_EQ(test::quo({"set", in + ".hdr", "Other/note", "kept", "--create"}).exit_status, 0);
-    for (const char* ending : {"", ".hdr"}) {
-        std::filesystem::permissions(in + ending, std::filesystem::perms{0600});
-        std::filesystem::create_symlink(std::string{"in.raw"} + ending, file("link") + ending);
-    }
-    ASSERT_EQ(test::quo({"convert", in, file("link"), "--order", "m"}).exit_status, 0);
-    for (const char* ending : {"", ".hdr"}) {
-        EXPECT_TRUE(std::filesystem::is_symlink(file("link") + ending));
-        EXPECT_EQ(std::filesystem::status(in + ending).permissions(), std::filesystem::perms{0600});
-    }
-    EXPECT_EQ(test::quo({"get", in + ".hdr", "Other/note"}).out, "kept\n");
-    EXPECT_EQ(test::quo({"get", in + ".hdr", "RasterInfo/ByteOrder"}).out, "1\n");
-    std::string expected;
-    for (int i = 0; i < 12; ++i) test::append_part(expected, INT16, test::part_value(i / 4, i % 4, 0), true);
-    EXPECT_TRUE(test::read_text(in) == expected);
-    EXPECT_EQ(files(), (std::set<std::string>{"in.raw", "in.raw.hdr", "link", "link.hdr"}));
-}
-
 /** A grey picture as its file shows it. */
 struct Grey {
     explicit Grey(const std::string& name) {
@@ -261,19 +185,6 @@ TEST_F(RasterVerbs, QuicklookShowsThePowerInDecibels) {
     EXPECT_THAT(grey("1x1"), testing::ElementsAre(100, 100, 200, 170, 0, 0, 255, 0));
     EXPECT_THAT(grey("1x2"), testing::ElementsAre(100, 190, 0, 255));  // 10 log10(6250) = 37.96
     EXPECT_THAT(grey("2x2"), testing::ElementsAre(85, 255));           // 10 log10(201 / 4) = 17.01
-}
-
-// Black for want of numbers is not black for want of power.
-TEST_F(RasterVerbs, QuicklookOfNoNumbersSaysSo) {
-    const std::string in = make("in.raw", 3, 4, FLOAT32, 0);
-    for (const float value : {std::nanf(""), 0.0F}) {
-        std::string bytes;
-        for (int i = 0; i < 12; ++i) test::append_bytes(bytes, value, false);
-        test::write_text(in, bytes);
-        const test::Finished finished = test::quo({"quicklook", in, file("picture.png")});
-        EXPECT_EQ(finished.exit_status, 0);
-        EXPECT_EQ(finished.messages().size(), value == 0.0F ? 0U : 1U);
-    }
 }
 
 // GDAL is the judge of the virtual rasters: it must see the very samples. It has no type of signed bytes

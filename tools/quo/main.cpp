@@ -74,25 +74,7 @@ int run(int argc, char** argv) {
     app.set_version_flag("--version", "quo " QUO_TOOL_VERSION);
     app.require_subcommand(1);
     tool::Job job;
-    tool::add_geolocate(app, job);
-    tool::add_orbit(app, job);
-    tool::add_time(app, job);
-    tool::add_tiepoints(app, job);
-    tool::add_info(app, job);
-    tool::add_validate(app, job);
-    tool::add_get(app, job);
-    tool::add_set(app, job);
-    tool::add_convert(app, job);
-    tool::add_quicklook(app, job);
-    tool::add_footprint(app, job);
-    tool::add_vrt(app, job);
-    tool::add_spectrum(app, job);
-    tool::add_resample(app, job);
-    tool::add_derive(app, job);
-    tool::add_fit(app, job);
-    tool::add_coregister(app, job);
-    tool::add_config(app, job);
-    tool::add_debug_dump(app, job);
+    for (const auto add : tool::kVerbs) add(app, job);
     take_either_name(app);
     try {
         app.parse(argc, argv);

@@ -1,0 +1,63 @@
+#include "picture.h"
+
+#include <png.h>
+
+#include <csetjmp>
+#include <memory>
+
+#include "failure.h"
+#include "output.h"
+
+namespace tool {
+namespace {
+
+/** What libpng's writing calls share. */
+class PngWriter {
+public:
+    PngWriter()
+        : png_{png_create_write_struct(PNG_LIBPNG_VER_STRING, nullptr, nullptr, nullptr)},
+          info_{png_ ? png_create_info_struct(png_) : nullptr} {
+        if (!info_) {
+            png_destroy_write_struct(&png_, nullptr);
+            throw Failure("no memory for a picture");
+        }
+        png_set_write_fn(png_, this, append, nullptr);
+    }
+    ~PngWriter() { png_destroy_write_struct(&png_, &info_); }
+    PngWriter(const PngWriter&) = delete;
+    PngWriter& operator=(const PngWriter&) = delete;
+
+    /** False when libpng gave up. Its errors jump back here, over nothing that needs to be destroyed. */
+    bool encode(const Picture& picture) {
+        if (setjmp(png_jmpbuf(png_))) return false;  // NOLINT(cert-err52-cpp): libpng's way of failing
+        png_set_IHDR(png_, info_, static_cast<png_uint_32>(picture.width),
+                     static_cast<png_uint_32>(picture.height), 8, PNG_COLOR_TYPE_GRAY, PNG_INTERLACE_NONE,
+                     PNG_COMPRESSION_TYPE_DEFAULT, PNG_FILTER_TYPE_DEFAULT);
+        png_write_info(png_, info_);
+        for (std::size_t row = 0; row < picture.height; ++row) {
+            png_write_row(png_, picture.grey.data() + row * picture.width);
+        }
+        png_write_end(png_, info_);
+        return true;
+    }
+    [[nodiscard]] const std::string& bytes() const { return bytes_; }
+
+private:
+    static void append(png_structp png, png_bytep data, std::size_t size) {
+        static_cast<PngWriter*>(png_get_io_ptr(png))->bytes_.append(reinterpret_cast<const char*>(data), size);
+    }
+
+    png_structp png_;
+    png_infop info_;
+    std::string bytes_;
+};
+
+}  // namespace
+
+void write_png(const Picture& picture, const std::string& name) {
+    PngWriter writer;
+    if (!writer.encode(picture)) throw Failure(name + ": the picture cannot be encoded");
+    write_output(name, writer.bytes());
+}
+
+}  // namespace tool

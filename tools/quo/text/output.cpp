@@ -1,0 +1,83 @@
+#include "output.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+
+#include "failure.h"
+#include "interrupt.h"
+#include "sarutillib/file_io.h"
+#include "shown.h"
+
+namespace tool {
+namespace {
+
+constexpr std::size_t kBlock = 1 << 16;
+
+}  // namespace
+
+Output::Output(const std::string& name) : name_{name == "-" ? "standard output" : name} {
+    struct stat about {};
+    if (name == "-") {
+        descriptor_ = STDOUT_FILENO;
+        terminal_ = isatty(descriptor_) == 1;
+    } else if (stat(name.c_str(), &about) == 0 && !S_ISREG(about.st_mode)) {
+        descriptor_ = open(name.c_str(), O_WRONLY | O_CLOEXEC);
+        if (descriptor_ < 0) fail();
+    } else {
+        file_ = std::make_unique<quo::AtomicFile>(name.c_str());
+        if (!file_->good()) fail();
+    }
+}
+
+Output::~Output() {
+    if (descriptor_ > STDERR_FILENO) close(descriptor_);
+}
+
+void Output::fail() const { throw Failure(name_ + ": " + system_cause()); }
+
+void Output::write(std::string_view text) {
+    throw_if_interrupted();
+    if (terminal_)
+        pending_ += shown_lines(text);  // tables pass on what stood in their input
+    else
+        pending_ += text;
+    if (pending_.size() >= kBlock) flush();
+}
+
+void Output::flush() {
+    throw_if_interrupted();
+    if (!file_) {
+        write_directly();
+    } else if (!file_->write(pending_)) {
+        fail();
+    }
+    pending_.clear();
+}
+
+void Output::write_directly() {
+    std::string_view rest = pending_;
+    while (!rest.empty()) {
+        throw_if_interrupted();
+        const ssize_t done = ::write(descriptor_, rest.data(), rest.size());
+        if (done < 0 && errno != EINTR) fail();
+        if (done > 0) rest.remove_prefix(static_cast<std::size_t>(done));
+    }
+}
+
+void Output::commit() {
+    flush();
+    if (!file_) return;
+    if (!file_->commit()) fail();
+    if (file_->in_place()) complain(name_ + ": written in place, no other file can be put there");
+}
+
+void write_output(const std::string& name, std::string_view text) {
+    Output output{name};
+    output.write(text);
+    output.commit();
+}
+
+}  // namespace tool

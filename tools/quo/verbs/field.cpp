@@ -1,0 +1,152 @@
+#include <cmath>
+#include <cstdint>
+#include <nlohmann/json.hpp>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include "commands.h"
+#include "document.h"
+#include "failure.h"
+#include "field_check.h"
+#include "number.h"
+#include "output.h"
+#include "product.h"
+#include "shown.h"
+
+namespace tool {
+namespace {
+
+struct FieldOptions {
+    std::string header, field;
+    std::vector<std::string> values;
+    bool json = false, create = false;
+};
+
+void require_field(const std::string& field) {
+    if (field.find('/') == std::string::npos) throw WrongUse("FIELD " + field + ": give it as Section/Field");
+}
+
+// A field that no object registers may be anything.
+bool is_number(const std::string& field) {
+    GeneralSAR product;
+    return is_numeric_field(product, field);
+}
+
+nlohmann::json as_json(const std::string& text, bool numeric) {
+    const auto number = numeric ? finite_number(text) : std::nullopt;
+    if (!number) return text;
+    const bool whole = text.find_first_of(".eE") == std::string::npos && std::abs(*number) < 1e15;
+    return whole ? nlohmann::json(static_cast<std::int64_t>(*number)) : nlohmann::json(*number);
+}
+
+std::string json_text(const nlohmann::json& value) {
+    return shown(value.dump(-1, ' ', false, nlohmann::json::error_handler_t::replace));
+}
+
+/** The values of a field, read without the document: headers can be far larger than one field of them. */
+class FieldReader {
+public:
+    explicit FieldReader(const FieldOptions& options)
+        : file_{options.header}, json_{options.json}, numeric_{options.json && is_number(options.field)} {
+        require_header_file(file_);
+        is_array_ = read(options.field + "/val");
+        if (!is_array_ && !read(options.field)) throw Failure(file_ + ": has no field " + options.field);
+    }
+
+    /** The values: in JSON those of an object's member, separated by commas, else lines. */
+    [[nodiscard]] const std::string& text() const { return text_; }
+    /** Whether they make a list in JSON. */
+    [[nodiscard]] bool is_list() const { return count_ != 1 || is_array_; }
+
+private:
+    /** Whether any element has the path. */
+    bool read(const std::string& path) {
+        constexpr int kChannel = 1;
+        forget_system_error();
+        const int status = quorelxml::readTexts(file_.c_str(), kChannel, path.c_str(), [&](std::string_view text) {
+            ++count_;  // a tree of all values would take many times the memory of their text
+            if (json_)
+                (text_ += count_ > 1 ? ",\n    " : "") += json_text(as_json(std::string{text}, numeric_));
+            else
+                (text_ += shown(text)) += '\n';
+        });
+        if (status != QUO_OK) refuse_header(file_, status, "is no header document");
+        return count_ > 0;
+    }
+
+    std::string file_, text_;
+    bool json_, numeric_, is_array_ = false;
+    std::int64_t count_ = 0;
+};
+
+int get_field(const FieldOptions& options) {
+    require_field(options.field);
+    FieldReader reader{options};
+    Output output{"-"};
+    if (options.json)
+        output.write("{\n  \"field\": " + json_text(options.field) +
+                     ",\n  \"value\": " + (reader.is_list() ? "[\n    " : ""));
+    output.write(reader.text());
+    if (options.json) output.write(reader.is_list() ? "\n  ]\n}\n" : "\n}\n");
+    output.commit();
+    return kFine;
+}
+
+// What would make the field say something that makes no sense. Fields that no object registers may hold anything
+// but, where polynomials and corner points are meant, words.
+std::string defect_of(const FieldOptions& options) {
+    GeneralSAR product;
+    if (const parElement* element = element_at(product, options.field))
+        return values_defect(*element, *element, options.values);
+    if (!is_numeric_field(product, options.field)) return "";
+    for (const std::string& value : options.values)
+        if (!finite_number(value)) return "\"" + value + "\" is no finite number";
+    return "";
+}
+
+int set_field(const FieldOptions& options) {
+    require_field(options.field);
+    for (const std::string& value : options.values) {
+        if (value.size() >= Document::kTextRoom) {
+            throw WrongUse("a value of " + std::to_string(value.size()) + " bytes");
+        }
+    }
+    const std::string defect = defect_of(options);
+    if (!defect.empty()) throw WrongUse(options.field + ": " + defect);
+    Document document{options.header};
+    if (!document.has(options.field) && !options.create) {
+        throw Failure(options.header + ": has no field " + options.field + " (--create makes it)");
+    }
+    document.replace(options.field, options.values);
+    document.save();
+    return kFine;
+}
+
+Verb<FieldOptions> add_field_verb(CLI::App& app, Job& job, const char* name, const char* about,
+                                  int (*run)(const FieldOptions&)) {
+    const auto verb = add_verb(app, job, name, about, run);
+    verb.command->add_option("HEADER", verb.options.header, "XML header file")->required();
+    verb.command->add_option("FIELD", verb.options.field, "Section/Field, such as SamplingConstants/prf_hz")
+        ->required();
+    return verb;
+}
+
+}  // namespace
+
+void add_get(CLI::App& app, Job& job) {
+    const auto [command, options] =
+        add_field_verb(app, job, "get", "Prints one field of a header, a line for each value", get_field);
+    command->add_flag("--json", options.json, "Print JSON");
+}
+
+void add_set(CLI::App& app, Job& job) {
+    const auto [command, options] =
+        add_field_verb(app, job, "set", "Changes one field of a header; everything else stays", set_field);
+    command->add_option("VALUE", options.values, "The value, or the values of an array")->required();
+    command->add_flag("--create", options.create, "Make the field where it is missing");
+}
+
+}  // namespace tool

@@ -1,0 +1,166 @@
+#include <nlohmann/json.hpp>
+#include <string_view>
+#include <vector>
+
+#include "commands.h"
+#include "date.h"
+#include "failure.h"
+#include "number.h"
+#include "product.h"
+#include "raster.h"
+#include "shown.h"
+
+namespace tool {
+namespace {
+
+/** What is known of a product, in the order in which it is shown: to people with rounded numbers and handy units,
+ * as JSON exactly. */
+class Facts {
+public:
+    void add(const char* name, const char* key, const std::string& text, nlohmann::ordered_json value) {
+        rows_.push_back({name, shown(text)});
+        json_[key] = std::move(value);
+    }
+    void add_text(const char* name, const char* key, const std::string& text) { add(name, key, text, text); }
+    /** A text that is not the mark of a missing one. */
+    void add_known(const char* name, const char* key, std::string_view text, std::string_view unknown) {
+        if (!text.empty() && text != unknown && text != "NOT_AVAILABLE") add_text(name, key, std::string{text});
+    }
+    /** A number that is not the mark of a missing one; people see `scale` times it in `unit`. */
+    void add_number(const char* name, const char* key, double value, double scale, const char* unit) {
+        if (value > kUnknown) add(name, key, handy(value * scale) + " " + unit, value);
+    }
+    void add_time(const char* name, const char* key, double seconds) {
+        const std::string date = date_text(seconds).value_or("-");
+        add(name, key, date + "  (" + exact(seconds) + " s)", {{"seconds", seconds}, {"date", date}});
+    }
+
+    [[nodiscard]] std::string text() const {
+        constexpr std::size_t kColumn = 20;
+        std::string text;
+        for (const auto& [name, value] : rows_) text += column(name, kColumn) + value + "\n";
+        return text;
+    }
+    [[nodiscard]] const nlohmann::ordered_json& json() const { return json_; }
+
+private:
+    static constexpr double kUnknown = -900.0;
+
+    struct Row {
+        std::string name, value;
+    };
+    std::vector<Row> rows_;
+    nlohmann::ordered_json json_;
+};
+
+void add_data_set(Facts& facts, const DataSetInfo_Obj& info) {
+    facts.add_known("mission", "mission", info.SensorName, "SENSOR UNKNOWN");
+    facts.add_known("mode", "mode", info.AcquisitionMode, "ACQUISITION MODE UNDEFINED");
+    facts.add_known("polarization", "polarization", info.Polarization, "");
+    facts.add_known("swath", "swath", info.Swath, "");
+    facts.add_known("scene", "scene", info.SceneID, "");
+    facts.add_known("description", "description", info.Description, "");
+    facts.add_known("image type", "image_type", info.ImageType, "NOT SET");
+    facts.add_known("projection", "projection", info.Projection, "PROJECTION UNDEFINED");
+    facts.add_text("look side", "look_side", info.LookDirection < 0 ? "left" : "right");
+}
+
+void add_region(Facts& facts, const ROI_Obj& region) {
+    if (region.isNULL() != 0) return;
+    facts.add_time("first line", "first_line", region.SlowStartTime);
+    facts.add_time("last line", "last_line", last_line_time(region));
+    facts.add_number("span", "span_s", region.SlowTimeLength, 1.0, "s");
+    facts.add("region", "region",
+              std::to_string(region.Lines) + " lines x " + std::to_string(region.Samples) + " samples",
+              {{"lines", region.Lines}, {"samples", region.Samples}});
+}
+
+void add_orbit(Facts& facts, const GeneralSAROrbit& orbit) {
+    const double last = orbit.t0SV_s + orbit.dtSV_s * (orbit.nSV_n - 1);
+    facts.add_text("orbit direction", "orbit_direction", orbit.isAscending() ? "ascending" : "descending");
+    facts.add("state vectors", "state_vectors",
+              std::to_string(orbit.nSV_n) + ", " + exact(orbit.dtSV_s) + " s apart, from " +
+                  date_text(orbit.t0SV_s).value_or("-") + " to " + date_text(last).value_or("-"),
+              {{"count", orbit.nSV_n}, {"spacing_s", orbit.dtSV_s}, {"first_s", orbit.t0SV_s}, {"last_s", last}});
+}
+
+void add_raster(Facts& facts, const RasterDescription& raster) {
+    facts.add("raster", "raster",
+              std::to_string(raster.NrOfLinesPerImage) + " lines x " + std::to_string(raster.NrOfPixelsPerLine) +
+                  " samples, " + type_name(raster.CellType) + ", " +
+                  (raster.ByteOrder == 1 ? "big-endian" : "little-endian"),
+              {{"lines", raster.NrOfLinesPerImage},
+               {"samples", raster.NrOfPixelsPerLine},
+               {"type", type_name(raster.CellType)},
+               {"order", raster.ByteOrder == 1 ? "m" : "l"},
+               {"header_offset", raster.HeaderOffset},
+               {"row_prefix", raster.RowPrefix}});
+}
+
+void add_sampling(Facts& facts, const SamplingConstants_Obj& sampling) {
+    facts.add_number("PRF", "prf_hz", sampling.prf_hz, 1.0, "Hz");
+    facts.add_number("sampling rate", "sampling_rate_hz", sampling.frg_hz, 1e-6, "MHz");
+    facts.add_number("carrier", "carrier_hz", sampling.fc_hz, 1e-9, "GHz");
+    facts.add_number("wavelength", "wavelength_m", sampling.lambda_m, 1.0, "m");
+    facts.add_number("range bandwidth", "range_bandwidth_hz", sampling.Brg_hz, 1e-6, "MHz");
+    facts.add_number("azimuth bandwidth", "azimuth_bandwidth_hz", sampling.Baz_hz, 1.0, "Hz");
+}
+
+void add_corners(Facts& facts, GeneralSAR& product) {
+    nlohmann::ordered_json list = nlohmann::json::array();
+    std::string text;
+    for (const Corner& corner : corners_of(product)) {
+        list.push_back({{"latitude_deg", corner.latitude_deg}, {"longitude_deg", corner.longitude_deg}});
+        text += (text.empty() ? "" : "; ") + fixed(corner.latitude_deg, 5) + " " + fixed(corner.longitude_deg, 5);
+    }
+    if (!text.empty()) facts.add("corners", "corners", text + "  (latitude longitude, degrees)", list);
+}
+
+void add_objects(Facts& facts, const GeneralSAR& product) {
+    constexpr const char* kNames[] = {"GSDataFile",   "GSRoi",          "polySAR",         "SamplingConstants",
+                                      "StateVectors", "Orbit",          "Pulse",           "AntennaPattern",
+                                      "DataSetInfo",  "SensorAttitude", "SpectralWindows", "geoCoords",
+                                      "SwathInfo",    "BufferFile"};
+    for (const bool present : {true, false}) {
+        nlohmann::ordered_json list = nlohmann::json::array();
+        std::string text;
+        for (int i = 0; i < GeneralSAR::kObjects; ++i) {
+            if (product.GSexists(static_cast<GSObject>(i)) != present) continue;
+            list.push_back(kNames[i]);
+            text += (text.empty() ? "" : " ") + std::string{kNames[i]};
+        }
+        const char* name = present ? "objects" : "absent";
+        facts.add(name, name, text.empty() ? "none" : text, list);
+    }
+}
+
+struct InfoOptions {
+    std::string header;
+    bool json = false;
+};
+
+int show_info(const InfoOptions& options) {
+    GeneralSAR product;
+    read_product(options.header, product);
+    Facts facts;
+    facts.add_text("header", "header", options.header);
+    if (product.GSexists(gsDataSetInfo)) add_data_set(facts, product.dataSetInfo);
+    if (product.GSexists(gsRoi)) add_region(facts, product.roi.Roi);
+    if (product.GSexists(gsOrbit)) add_orbit(facts, product.orbit);
+    if (const RasterDescription* raster = described_raster(product)) add_raster(facts, *raster);
+    if (product.GSexists(gsSamplingConstants)) add_sampling(facts, product.samplingConstants);
+    add_corners(facts, product);
+    add_objects(facts, product);
+    options.json ? print_json(facts.json()) : print(facts.text());
+    return kFine;
+}
+
+}  // namespace
+
+void add_info(CLI::App& app, Job& job) {
+    const auto [command, options] = add_verb(app, job, "info", "What a product is: one screen", show_info);
+    command->add_option("HEADER", options.header, "Product header")->required();
+    command->add_flag("--json", options.json, "Print JSON");
+}
+
+}  // namespace tool

@@ -1,0 +1,194 @@
+#include <algorithm>
+#include <cmath>
+#include <complex>
+#include <limits>
+#include <vector>
+
+#include "apart.h"
+#include "commands.h"
+#include "failure.h"
+#include "interrupt.h"
+#include "number.h"
+#include "picture.h"
+#include "progress.h"
+#include "raster.h"
+
+namespace tool {
+namespace {
+
+struct QuicklookOptions {
+    std::string raster, picture, looks, db = "auto";
+    int width = 1000;
+    bool waitbar = false;
+};
+
+struct Looks {
+    int azimuth, range;
+};
+struct Stretch {
+    double low_db, high_db;
+};
+
+Looks looks_of(const QuicklookOptions& options, const DataFile& raster) {
+    if (options.looks.empty()) {
+        // The same number both ways, so that neither the width nor four times it in height is exceeded.
+        const auto times = [](int length, std::int64_t most) {
+            return static_cast<int>((std::int64_t{length} + most - 1) / most);
+        };
+        const int looks = std::max({1, times(raster.NrOfPixelsPerLine, options.width),
+                                    times(raster.NrOfLinesPerImage, 4 * std::int64_t{options.width})});
+        return {looks, looks};
+    }
+    const auto x = options.looks.find('x');
+    const auto azimuth = finite_number(std::string_view{options.looks}.substr(0, x));
+    const auto range =
+        x == std::string::npos ? std::nullopt : finite_number(std::string_view{options.looks}.substr(x + 1));
+    if (!azimuth || !range || !(*azimuth >= 1.0 && *azimuth <= 1e6) || !(*range >= 1.0 && *range <= 1e6)) {
+        throw WrongUse("--looks " + options.looks + ": not of the form AxR, such as 4x1");
+    }
+    return {static_cast<int>(*azimuth), static_cast<int>(*range)};
+}
+
+/** The mean power of looks x looks samples each, over the whole raster, read tile by tile. Looks at the far ends
+ * that are not full are left out. */
+class Multilook {
+public:
+    Multilook(const RasterDescription& raster, const std::string& name, Looks looks)
+        : looks_{std::min(looks.azimuth, raster.NrOfLinesPerImage),
+                 std::min(looks.range, raster.NrOfPixelsPerLine)},
+          width_{static_cast<std::size_t>(raster.NrOfPixelsPerLine / looks_.range)},
+          height_{static_cast<std::size_t>(raster.NrOfLinesPerImage / looks_.azimuth)},
+          file_{name, raster} {
+        if (width_ * height_ > kMostPixels) {
+            throw Failure(name + ": a picture of " + std::to_string(width_) + " x " + std::to_string(height_) +
+                          " pixels is too large; take more looks");
+        }
+        power_.assign(width_ * height_, 0.0F);
+    }
+
+    void run(bool waitbar) {
+        const int lines = static_cast<int>(height_) * looks_.azimuth;
+        const int samples = static_cast<int>(width_) * looks_.range;
+        Progress progress{Progress::Unit::kBytes, waitbar ? "Quick look" : nullptr};
+        const std::int64_t bytes = file_.description().element_sizeof();
+        for_each_tile(lines, samples, looks_.range, [&](const Tile& tile) {
+            throw_if_interrupted();
+            file_.description().is_complex() != 0 ? add(tile, complex_) : add(tile, real_);
+            const std::int64_t done =
+                std::int64_t{tile.first_line + tile.lines - 1} * samples + tile.first_sample + tile.samples;
+            progress.step(done * bytes, std::int64_t{lines} * samples * bytes);
+        });
+        const float scale = 1.0F / (static_cast<float>(looks_.azimuth) * static_cast<float>(looks_.range));
+        for (float& value : power_) value *= scale;
+    }
+
+    [[nodiscard]] std::size_t width() const { return width_; }
+    [[nodiscard]] std::size_t height() const { return height_; }
+    /** Whether any sample has a power that is a finite number. */
+    [[nodiscard]] bool has_power() const { return has_power_; }
+    /** Row after row; values that are no number count as 0. */
+    [[nodiscard]] const std::vector<float>& power() const { return power_; }
+
+private:
+    static constexpr std::size_t kMostPixels = std::size_t{1} << 26;
+
+    template <typename T>
+    void add(const Tile& tile, std::vector<T>& room) {
+        room.resize(tile.size());
+        file_.read(tile, room.data());
+        const T* from = room.data();
+        const auto first = static_cast<std::size_t>(tile.first_sample / looks_.range);
+        for (int line = tile.first_line; line < tile.first_line + tile.lines; ++line) {
+            float* to = power_.data() + static_cast<std::size_t>(line / looks_.azimuth) * width_ + first;
+            for (int pixel = 0; pixel < tile.samples / looks_.range; ++pixel) {
+                for (int look = 0; look < looks_.range; ++look) {
+                    const float value = std::norm(*from++);
+                    const bool finite = std::isfinite(value);
+                    to[pixel] += finite ? value : 0.0F;
+                    has_power_ |= finite;
+                }
+            }
+        }
+    }
+
+    Looks looks_;
+    std::size_t width_, height_;
+    RasterReader file_;
+    std::vector<float> power_;
+    bool has_power_ = false;
+    std::vector<float> real_;  // the samples of a tile, as the raster has them
+    std::vector<fcomplex> complex_;
+};
+
+double decibel(float power) {
+    return power > 0.0F ? 10.0 * std::log10(static_cast<double>(power)) : -std::numeric_limits<double>::infinity();
+}
+
+// From the 2nd to the 98th percentile of what is not empty, and never less than 3 dB. A part of the pixels, evenly
+// taken, tells the percentiles of a large picture.
+Stretch automatic_stretch(const std::vector<float>& power) {
+    constexpr std::size_t kEnough = 1 << 20;
+    const std::size_t step = 1 + power.size() / kEnough;
+    std::vector<float> filled;
+    for (std::size_t i = 0; i < power.size(); i += step) {
+        if (power[i] > 0.0F) filled.push_back(power[i]);
+    }
+    if (filled.empty()) return {0.0, 1.0};
+    const auto percentile = [&](double share) {
+        const auto index = static_cast<std::ptrdiff_t>(share * static_cast<double>(filled.size() - 1));
+        std::ranges::nth_element(filled, filled.begin() + index);
+        return decibel(filled[static_cast<std::size_t>(index)]);
+    };
+    const double low = percentile(0.02), high = percentile(0.98);
+    const double widen = std::max(0.0, 0.5 * (3.0 - (high - low)));
+    return {low - widen, high + widen};
+}
+
+Stretch stretch_of(const QuicklookOptions& options, const std::vector<float>& power) {
+    if (options.db == "auto") return automatic_stretch(power);
+    const auto colon = options.db.find(':');
+    const auto low = finite_number(std::string_view{options.db}.substr(0, colon));
+    const auto high =
+        colon == std::string::npos ? std::nullopt : finite_number(std::string_view{options.db}.substr(colon + 1));
+    if (!low || !high || !(*low < *high))
+        throw WrongUse("--db " + options.db + ": not of the form MIN:MAX or auto");
+    return {*low, *high};
+}
+
+int quicklook(const QuicklookOptions& options) {
+    require_apart(raster_files(options.raster), {options.picture});
+    if (options.width < 1) throw WrongUse("--width " + std::to_string(options.width));
+    DataFile raster;
+    read_samples_description(options.raster, raster);
+    note_interrupts();
+    Multilook multilook{raster, options.raster, looks_of(options, raster)};
+    multilook.run(options.waitbar);
+    const Stretch stretch = stretch_of(options, multilook.power());
+    Picture picture{multilook.width(), multilook.height(), {}};
+    picture.grey.reserve(multilook.power().size());
+    for (const float power : multilook.power()) {
+        const double share = (decibel(power) - stretch.low_db) / (stretch.high_db - stretch.low_db);
+        picture.grey.push_back(static_cast<std::uint8_t>(std::lround(255.0 * std::clamp(share, 0.0, 1.0))));
+    }
+    write_png(picture, options.picture);
+    if (!multilook.has_power())
+        complain(options.raster + ": no sample has a power that is a finite number, the picture is black");
+    return kFine;
+}
+
+}  // namespace
+
+void add_quicklook(CLI::App& app, Job& job) {
+    const auto [command, options] =
+        add_verb(app, job, "quicklook", "Shows a raster as a picture: power in dB, multilooked", quicklook);
+    command->add_option("RASTER", options.raster, "Raster with a side file RASTER.hdr")->required();
+    command->add_option("OUT", options.picture, "Picture to write (PNG)")->required();
+    CLI::Option* looks =
+        command->add_option("--looks", options.looks, "Lines x samples averaged into a pixel, such as 4x1");
+    command->add_option("--db", options.db, "Black and white: MIN:MAX in dB, or auto (2nd to 98th percentile)");
+    command->add_option("--width", options.width, "Greatest width in pixels, in place of --looks (1000)")
+        ->excludes(looks);
+    add_waitbar_option(*command, options.waitbar);
+}
+
+}  // namespace tool

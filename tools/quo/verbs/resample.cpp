@@ -1,0 +1,252 @@
+#include <algorithm>
+#include <climits>
+#include <complex>
+#include <numbers>
+#include <optional>
+#include <vector>
+
+#include "apart.h"
+#include "commands.h"
+#include "failure.h"
+#include "interrupt.h"
+#include "number.h"
+#include "progress.h"
+#include "quo_base/interp.h"
+#include "raster.h"
+#include "transform.h"
+
+namespace tool {
+namespace {
+
+struct ResampleOptions {
+    std::string in, out;
+    int samples = 0, lines = 0;  // one of them is wanted
+    double centre = 0.0;         // cycles per sample
+    bool waitbar = false;
+};
+
+/** Width and height of an image in memory. */
+struct Size {
+    int nx, ny;
+    [[nodiscard]] std::size_t count() const { return static_cast<std::size_t>(nx) * static_cast<std::size_t>(ny); }
+};
+
+/** A phase that turns by so many cycles from sample to sample. */
+std::vector<fcomplex> ramp(double cycles, int count) {
+    std::vector<fcomplex> turns;
+    turns.reserve(static_cast<std::size_t>(count));
+    for (int k = 0; k < count; ++k) turns.emplace_back(std::polar(1.0, 2.0 * std::numbers::pi * cycles * k));
+    return turns;
+}
+
+/** Brings images of one size to another, along one axis: a longer one by zero-padding of the spectrum, a shorter
+ * one by cutting it, which keeps what the new sampling can hold. Rows are taken one by one: along them, images
+ * have a single one. */
+class Resampler {
+public:
+    /** @param centre  of the band, cycles per sample of the input, which is brought to frequency 0 meanwhile */
+    Resampler(const Size& in, const Size& out, double centre) : in_{in}, out_{out} {
+        make_plans();  // first: they are refused where the lengths are beyond memory
+        if (centre == 0.0) return;
+        const double length_in = length(in), length_out = length(out);
+        down_ = ramp(-centre, length(in));
+        up_ = ramp(centre * length_in / length_out, length(out));
+    }
+
+    /** The input is overwritten. */
+    void run(fcomplex* from, fcomplex* to) {
+        turn(from, down_);
+        forward_ ? shorten(from, to) : require_transform(longer_.interpft_p(from, to));
+        turn(to, up_);
+    }
+
+private:
+    void make_plans() {
+        if (out_.count() >= in_.count()) {
+            require_transform(longer_.setplans(in_.nx, in_.ny, out_.nx, out_.ny));
+            return;
+        }
+        const int rows = along() ? 1 : 0, columns = 1 - rows;
+        forward_.emplace(in_.nx, in_.ny, rows, columns);
+        inverse_.emplace(out_.nx, out_.ny, -2 * rows, -2 * columns);
+    }
+    [[nodiscard]] bool along() const { return in_.ny == 1 && out_.ny == 1; }
+    [[nodiscard]] int length(const Size& size) const { return along() ? size.nx : size.ny; }
+    /** Samples that belong together: of a row that is a place on the axis, or single ones. */
+    [[nodiscard]] std::ptrdiff_t step() const { return along() ? 1 : in_.nx; }
+
+    void turn(fcomplex* image, const std::vector<fcomplex>& turns) const {
+        for (const fcomplex by : turns)
+            for (std::ptrdiff_t k = 0; k < step(); ++k) *image++ *= by;
+    }
+
+    void shorten(fcomplex* from, fcomplex* to) const {
+        forward_->run(from);
+        // The lowest frequencies of either sign; of an even number, one more of the negative.
+        const std::ptrdiff_t upper = (length(out_) + 1) / 2, lower = length(out_) - upper;
+        std::copy_n(from, upper * step(), to);
+        std::copy_n(from + (length(in_) - lower) * step(), lower * step(), to + upper * step());
+        inverse_->run(to);
+        const float factor = 1.0F / static_cast<float>(length(in_));
+        std::transform(to, to + out_.count(), to, [factor](fcomplex value) { return value * factor; });
+    }
+
+    Size in_, out_;
+    std::vector<fcomplex> down_, up_;  // empty where the band is centred
+    interp longer_;
+    std::optional<Transform> forward_, inverse_;
+};
+
+/** The description of the raster that the options ask for. */
+class Wanted : public RasterDescription {
+public:
+    Wanted(const ResampleOptions& options, const RasterDescription& in) {
+        copyDescription(in);
+        HeaderOffset = 0;
+        RowPrefix = 0;
+        (options.lines > 0 ? NrOfLinesPerImage : NrOfPixelsPerLine) = std::max(options.lines, options.samples);
+    }
+};
+
+/** A raster of another number of samples or lines. */
+class Resampling {
+public:
+    Resampling(const ResampleOptions& options, const RasterDescription& in)
+        : lines_{options.lines > 0},
+          centre_{options.centre},
+          in_{options.in, in},
+          out_{options.out, Wanted{options, in}} {}
+
+    void run(bool waitbar) {
+        resample_all(waitbar);
+        throw_if_interrupted();
+        out_.commit();
+        out_.say_losses();
+    }
+
+private:
+    void resample_all(bool waitbar) {
+        Progress progress{Progress::Unit::kBytes, waitbar ? "Resampling" : nullptr};
+        lines_ ? by_strips(progress) : by_lines(progress);
+    }
+
+    [[nodiscard]] const RasterDescription& from() const { return in_.description(); }
+    [[nodiscard]] const RasterDescription& to() const { return out_.description(); }
+
+    // Each line is an image of its own, so that nothing depends on how many are read at once.
+    void by_lines(Progress& progress) {
+        const Size in{from().NrOfPixelsPerLine, 1}, out{to().NrOfPixelsPerLine, 1};
+        Resampler resampler{in, out, centre_};
+        source_.resize(in.count());
+        result_.resize(out.count());
+        for (int line = 0; line < from().NrOfLinesPerImage; ++line) {
+            throw_if_interrupted();
+            in_.read({line, 1, 0, in.nx}, source_.data());
+            resampler.run(source_.data(), result_.data());
+            write({line, 1, 0, out.nx});
+            progress.step(sample_offset(to(), line, out.nx), to().rasterSize());
+        }
+    }
+
+    // Whole columns, as many of them as memory should hold; the last strip may overlap the one before.
+    void by_strips(Progress& progress) {
+        const int lines_in = from().NrOfLinesPerImage, lines_out = to().NrOfLinesPerImage;
+        const int samples = from().NrOfPixelsPerLine;
+        const auto fitting = kStripSamples / (std::int64_t{lines_in} + lines_out);
+        const int width = static_cast<int>(std::clamp<std::int64_t>(fitting, 1, samples));
+        const Size in{width, lines_in}, out{width, lines_out};
+        Resampler resampler{in, out, centre_};
+        take_room();
+        source_.resize(in.count());
+        result_.resize(out.count());
+        for (std::int64_t next = 0; next < samples; next += width) {
+            throw_if_interrupted();
+            const int first = static_cast<int>(std::min<std::int64_t>(next, samples - width));
+            in_.read({0, lines_in, first, width}, source_.data());
+            resampler.run(source_.data(), result_.data());
+            const int known = static_cast<int>(next) - first;
+            keep_columns(known, width, lines_out);
+            write({0, lines_out, first + known, width - known});
+            progress.step((first + width) * std::int64_t{lines_out}, std::int64_t{samples} * lines_out);
+        }
+    }
+
+    // Takes the first columns out of the result: the strip before has them.
+    void keep_columns(int first, int width, int lines) {
+        for (int line = 0; first > 0 && line < lines; ++line) {
+            const auto row = result_.begin() + std::ptrdiff_t{line} * width;
+            std::copy(row + first, row + width, result_.begin() + std::ptrdiff_t{line} * (width - first));
+        }
+    }
+
+    // Strips leave gaps for those that follow: a disk that is too small must be found before.
+    void take_room() {
+        for_each_tile(to().NrOfLinesPerImage, to().NrOfPixelsPerLine, 1, [this](const Tile& tile) {
+            throw_if_interrupted();
+            result_.assign(tile.size(), {});
+            write(tile);
+        });
+    }
+
+    void write(const Tile& tile) {
+        if (to().CellType == FLOAT_COMPLEX) return out_.write(tile, result_.data());
+        if (to().is_complex() != 0) {
+            doubles_.assign(result_.begin(), result_.begin() + static_cast<std::ptrdiff_t>(tile.size()));
+            return out_.write(tile, doubles_.data());
+        }
+        to().CellType == FLOAT32 ? write_real(tile, real_singles_) : write_real(tile, real_doubles_);
+    }
+    template <typename T>
+    void write_real(const Tile& tile, std::vector<T>& room) {
+        room.resize(tile.size());
+        std::transform(result_.begin(), result_.begin() + static_cast<std::ptrdiff_t>(tile.size()), room.begin(),
+                       [](fcomplex value) { return static_cast<T>(value.real()); });
+        out_.write(tile, room.data());
+    }
+
+    static constexpr std::int64_t kStripSamples = 8 << 20;  // read and written: 64 MiB
+
+    bool lines_;
+    double centre_;
+    RasterReader in_;
+    NewRaster out_;
+    std::vector<fcomplex> source_, result_;
+    std::vector<dcomplex> doubles_;
+    std::vector<float> real_singles_;
+    std::vector<double> real_doubles_;
+};
+
+/** What is wrong with a centre; empty for none. A range alone lets through what is no number. */
+std::string defect_of_centre(const std::string& text) {
+    const auto centre = finite_number(text);
+    if (!centre) return text + " is no number of cycles per sample";
+    return *centre >= -0.5 && *centre <= 0.5 ? "" : text + " is not within -0.5 to 0.5 cycles per sample";
+}
+
+int resample(const ResampleOptions& options) {
+    require_raster_apart(options.in, options.out);
+    DataFile description;
+    read_samples_description(options.in, description);
+    if (options.centre != 0.0 && description.is_complex() == 0)
+        throw WrongUse("--centre: samples that are real have a band around 0");
+    note_interrupts();
+    Resampling{options, description}.run(options.waitbar);
+    return kFine;
+}
+
+}  // namespace
+
+void add_resample(CLI::App& app, Job& job) {
+    const auto [command, options] =
+        add_verb(app, job, "resample", "Changes the number of samples or lines of a raster of any size", resample);
+    command->add_option("IN", options.in, "Raster with a side file IN.hdr")->required();
+    command->add_option("OUT", options.out, "Raster to write, with a side file OUT.hdr")->required();
+    CLI::App* size = command->add_option_group("New size")->require_option(1);
+    size->add_option("--samples", options.samples, "Samples per line")->check(CLI::Range(1, INT_MAX));
+    size->add_option("--lines", options.lines, "Lines")->check(CLI::Range(1, INT_MAX));
+    command->add_option("--centre", options.centre, "Centre of the band in cycles per sample, where it is not 0")
+        ->check(defect_of_centre);
+    add_waitbar_option(*command, options.waitbar);
+}
+
+}  // namespace tool

@@ -1,0 +1,223 @@
+#include <algorithm>
+#include <cmath>
+#include <complex>
+#include <limits>
+#include <nlohmann/json.hpp>
+#include <numbers>
+#include <vector>
+
+#include "apart.h"
+#include "commands.h"
+#include "failure.h"
+#include "interrupt.h"
+#include "number.h"
+#include "plot.h"
+#include "progress.h"
+#include "quo_base/acquisition.h"
+#include "raster.h"
+#include "shown.h"
+#include "transform.h"
+
+namespace tool {
+namespace {
+
+struct SpectrumOptions {
+    std::string raster, picture, header;
+    bool json = false, waitbar = false;
+};
+
+constexpr int kLongest = 1024;  // samples and lines of a segment
+
+/** The mean power of segments, bin by bin; frequencies from 0 up. */
+using Power = std::vector<double>;
+
+/** A taper, so that strong targets stay within their bins. */
+std::vector<float> hann(int length) {
+    std::vector<float> window(static_cast<std::size_t>(length));
+    double place = 0.5;
+    for (float& factor : window)
+        factor = static_cast<float>(0.5 - 0.5 * std::cos(2.0 * std::numbers::pi * place++ / length));
+    return window;
+}
+
+/** Where segments of a length start so that all of an axis is covered; the last two may overlap. */
+std::vector<int> starts(int in_all, int length) {
+    std::vector<int> firsts;
+    for (std::int64_t first = 0; first < in_all; first += length)
+        firsts.push_back(static_cast<int>(std::min<std::int64_t>(first, in_all - length)));
+    return firsts;
+}
+
+/** The power spectra of a raster of any size, segment by segment. */
+class Spectra {
+public:
+    Spectra(const std::string& name, const RasterDescription& description)
+        : lines_{std::min(kLongest, description.NrOfLinesPerImage)},
+          samples_{std::min(kLongest, description.NrOfPixelsPerLine)},
+          file_{name, description},
+          along_{samples_, lines_, +1, 0},
+          down_{samples_, lines_, 0, +1} {}
+
+    void run(bool waitbar) {
+        Progress progress{Progress::Unit::kBytes, waitbar ? "Spectrum" : nullptr};
+        const RasterDescription& raster = file_.description();
+        const auto first_lines = starts(raster.NrOfLinesPerImage, lines_);
+        const auto first_samples = starts(raster.NrOfPixelsPerLine, samples_);
+        const auto in_all = static_cast<std::int64_t>(first_lines.size() * first_samples.size());
+        for (const int line : first_lines)
+            for (const int sample : first_samples) {
+                throw_if_interrupted();
+                add({line, lines_, sample, samples_});
+                progress.step(++segments_ * segment_bytes(), in_all * segment_bytes());
+            }
+    }
+
+    [[nodiscard]] int lines() const { return lines_; }
+    [[nodiscard]] int samples() const { return samples_; }
+    [[nodiscard]] std::int64_t segments() const { return segments_; }
+    [[nodiscard]] const Power& range() const { return range_; }
+    [[nodiscard]] const Power& azimuth() const { return azimuth_; }
+
+private:
+    [[nodiscard]] std::int64_t segment_bytes() const {
+        return std::int64_t{lines_} * samples_ * file_.description().element_sizeof();
+    }
+    void add(const Tile& tile) {
+        segment_.resize(tile.size());
+        file_.read(tile, segment_.data());
+        for (fcomplex& value : segment_)
+            if (!std::isfinite(std::norm(value))) value = {};
+        work_ = segment_;
+        each([&](std::size_t /*line*/, std::size_t sample, fcomplex& value) { value *= range_window_[sample]; });
+        along_.run(work_.data());
+        each([&](std::size_t /*line*/, std::size_t sample, fcomplex& value) {
+            range_[sample] += std::norm(value);
+        });
+        work_ = segment_;
+        each([&](std::size_t line, std::size_t /*sample*/, fcomplex& value) { value *= azimuth_window_[line]; });
+        down_.run(work_.data());
+        each([&](std::size_t line, std::size_t /*sample*/, fcomplex& value) {
+            azimuth_[line] += std::norm(value);
+        });
+    }
+    template <typename Work>
+    void each(Work work) {
+        auto value = work_.begin();
+        for (std::size_t line = 0; line < azimuth_.size(); ++line)
+            for (std::size_t sample = 0; sample < range_.size(); ++sample) work(line, sample, *value++);
+    }
+
+    int lines_, samples_;
+    std::int64_t segments_ = 0;
+    RasterReader file_;
+    Transform along_, down_;
+    std::vector<float> range_window_ = hann(samples_), azimuth_window_ = hann(lines_);
+    Power range_ = Power(static_cast<std::size_t>(samples_)), azimuth_ = Power(static_cast<std::size_t>(lines_));
+    std::vector<fcomplex> segment_, work_;
+};
+
+/** What a spectrum tells, in cycles per sample. */
+struct Band {
+    double centre, width;
+};
+
+/** Mean over neighbouring bins, around the end. */
+Power smoothed(const Power& power) {
+    const std::size_t n = power.size(), reach = n / 128;
+    Power mean(n);
+    for (std::size_t k = 0; k < n; ++k) {
+        for (std::size_t i = n - reach; i <= n + reach; ++i) mean[k] += power[(k + i) % n];
+        mean[k] /= static_cast<double>(2 * reach + 1);
+    }
+    return mean;
+}
+
+/** The centre is the phase of the correlation of neighbouring samples (S. N. Madsen, "Estimating the Doppler
+ * Centroid of SAR Data", IEEE Trans. Aerosp. Electron. Syst. 25(2), 1989), the width that above half the peak. */
+Band band_of(const Power& power) {
+    const auto n = static_cast<double>(power.size());
+    dcomplex correlation{};
+    for (std::size_t k = 0; k < power.size(); ++k)
+        correlation += std::polar(power[k], 2.0 * std::numbers::pi * static_cast<double>(k) / n);
+    const Power mean = smoothed(power);
+    const double half = 0.5 * *std::ranges::max_element(mean);
+    const auto above = std::ranges::count_if(mean, [half](double value) { return value > half; });
+    return {std::arg(correlation) / (2.0 * std::numbers::pi), static_cast<double>(above) / n};
+}
+
+/** Sampling rates of both directions; 1 and cycles per sample where no header tells them. */
+struct Rates {
+    const char* unit = "cycles/sample";
+    double range = 1.0, azimuth = 1.0;
+};
+
+Rates rates_of(const std::string& header) {
+    if (header.empty()) return {};
+    SamplingConstants_Obj constants;
+    if (constants.readhdr(header.c_str()) != QUO_OK) throw Failure(header + ": no sampling constants");
+    if (!(constants.frg_hz > 0.0) || !(constants.prf_hz > 0.0))
+        throw Failure(header + ": range sampling rate or pulse repetition frequency is unknown");
+    return {"Hz", constants.frg_hz, constants.prf_hz};
+}
+
+Curve curve_of(const char* direction, const Power& power, double centre, double rate, const char* unit) {
+    const double scale = rate >= 1e6 ? 1e-6 : rate >= 1e3 ? 1e-3 : 1.0;
+    const char* prefix = rate >= 1e6 ? "M" : rate >= 1e3 ? "k" : "";
+    Curve curve{std::string{direction} + " dB / " + prefix + unit, smoothed(power), -0.5 * rate * scale,
+                0.5 * rate * scale, centre * rate * scale};
+    const double peak = *std::ranges::max_element(curve.decibel);
+    for (double& value : curve.decibel) value = 10.0 * std::log10(value / peak);  // nothing is far below
+    const auto count = static_cast<std::ptrdiff_t>(power.size());
+    std::rotate(curve.decibel.begin(), curve.decibel.end() - count / 2, curve.decibel.end());
+    return curve;
+}
+
+int spectrum(const SpectrumOptions& options) {
+    std::vector<std::string> read = raster_files(options.raster);
+    if (!options.header.empty()) read.push_back(options.header);
+    require_apart(read, {options.picture});
+    const Rates rates = rates_of(options.header);
+    DataFile raster;
+    read_samples_description(options.raster, raster);
+    note_interrupts();
+    Spectra spectra{options.raster, raster};
+    spectra.run(options.waitbar);
+    if (!(*std::ranges::max_element(spectra.range()) > 0.0)) throw Failure(options.raster + ": holds no signal");
+    const Band range = band_of(spectra.range()), azimuth = band_of(spectra.azimuth());
+    write_png(plot({curve_of("range", spectra.range(), range.centre, rates.range, rates.unit),
+                    curve_of("azimuth", spectra.azimuth(), azimuth.centre, rates.azimuth, rates.unit)}),
+              options.picture);
+
+    const std::pair<const char*, double> values[] = {{"range_centre", range.centre * rates.range},
+                                                     {"range_bandwidth", range.width * rates.range},
+                                                     {"doppler_centroid", azimuth.centre * rates.azimuth},
+                                                     {"azimuth_bandwidth", azimuth.width * rates.azimuth}};
+    nlohmann::ordered_json json{{"raster", options.raster},
+                                {"segments", spectra.segments()},
+                                {"segment_lines", spectra.lines()},
+                                {"segment_samples", spectra.samples()},
+                                {"unit", rates.unit}};
+    std::string text = "# mean of " + std::to_string(spectra.segments()) + " segments of " +
+                       std::to_string(spectra.lines()) + " lines x " + std::to_string(spectra.samples()) +
+                       " samples\nquantity,value,unit\n";
+    for (const auto& [name, value] : values) {
+        json[name] = value;
+        text += std::string{name} + "," + exact(value) + "," + rates.unit + "\n";
+    }
+    options.json ? print_json(json) : print(text);
+    return kFine;
+}
+
+}  // namespace
+
+void add_spectrum(CLI::App& app, Job& job) {
+    const auto [command, options] = add_verb(
+        app, job, "spectrum", "Range and azimuth power spectra of a raster, and what they tell", spectrum);
+    command->add_option("RASTER", options.raster, "Raster with a side file RASTER.hdr")->required();
+    command->add_option("OUT", options.picture, "Plot to write (PNG)")->required();
+    command->add_option("--header", options.header, "Header with the sampling rates, for frequencies in Hz");
+    command->add_flag("--json", options.json, "Print JSON");
+    add_waitbar_option(*command, options.waitbar);
+}
+
+}  // namespace tool

@@ -1,0 +1,45 @@
+#include <nlohmann/json.hpp>
+
+#include "commands.h"
+#include "date.h"
+#include "failure.h"
+#include "number.h"
+#include "shown.h"
+
+namespace tool {
+namespace {
+
+struct TimeOptions {
+    std::vector<std::string> times;
+    bool json = false;
+};
+
+int convert_times(const TimeOptions& options) {
+    int result = kFine;
+    nlohmann::json list = nlohmann::json::array();
+    std::string text;
+    for (const std::string& time : options.times) {
+        const double seconds = seconds_of(time);
+        const auto date = date_text(seconds);
+        if (!date) {
+            complain(time + ": date texts reach from 1985 to 9999");
+            result = kFindings;
+        }
+        list.push_back({{"seconds", seconds}, {"date", date ? nlohmann::json(*date) : nlohmann::json()}});
+        text += exact(seconds) + "  " + date.value_or("-") + "\n";
+    }
+    options.json ? print_json(list) : print(text);
+    return result;
+}
+
+}  // namespace
+
+void add_time(CLI::App& app, Job& job) {
+    const auto [command, options] =
+        add_verb(app, job, "time", "Seconds since 1985 to date texts, and back", convert_times);
+    command->add_option("TIME", options.times, "Seconds, or a date such as \"04-JAN-2022 17:05:58.5\"")
+        ->required();
+    command->add_flag("--json", options.json, "Print JSON");
+}
+
+}  // namespace tool
