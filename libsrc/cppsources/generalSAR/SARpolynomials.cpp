@@ -39,24 +39,8 @@ constexpr std::int64_t kShortestPolynomial = 40;
 
 namespace plain {
 using Obj = poly;
-/** The fields of a polynomial with one quantity's parameter-file keys. */
-constexpr auto table(const char* coefficients, const char* range, const char* azimuth) {
-    return quo::FieldTable{kSetSection, QUO_FIELD(pol, coefficients),
-                           QUO_FIELD(trg0, quo::element("trg0_s"), range),
-                           QUO_FIELD(taz0, quo::element("taz0_s"), azimuth)};
-}
-using Table = decltype(table("", "", ""));
-constexpr Table kTable = table("pol", "trg0_s", "taz0_s");
-constexpr Table kDC = table("DCpoly", "DCpoly_rgt0", "DCpoly_azt0");
-constexpr Table kFR = table("FRpoly", "FRPoly_rgt0", "FRpoly_azt0");  // deliberate: the capital P of the range key
-constexpr Table kSL2GR = table("SL2GRpoly", "SL2GRpoly_rgt0", "SL2GRpoly_azt0");
-constexpr Table kGR2SL = table("GR2SLpoly", "GR2SLpoly_rgt0", "GR2SLpoly_azt0");
-constexpr Table kSL2THETA = table("SL2THETApoly", "SL2THETApoly_rgt0", "SL2THETApoly_azt0");
-constexpr Table kSL2PHI = table("SL2PHIpoly", "SL2PHIpoly_rgt0", "SL2PHIpoly_azt0");
-
-int read(poly& object, const char* file, const char* name, const Table& table) {
-    return object.poly::readpar(file, name) == QUO_OK ? QUO_OK : table.read_profile(object, file, name);
-}
+constexpr quo::FieldTable kTable{kSetSection, QUO_FIELD(pol), QUO_FIELD(trg0, quo::element("trg0_s")),
+                                 QUO_FIELD(taz0, quo::element("taz0_s"))};
 }  // namespace plain
 
 namespace extended {
@@ -85,17 +69,27 @@ bool read_doubles(const char* section, const char* key, double* values, int coun
 
 /** What tells the six lists apart. */
 struct Quantity {
-    const char *name, *file_name, *none;
+    const char *file_name, *none;
     bool extrapolates;
+    const char* keys[3];  // of the fields of one polynomial in a parameter file
 };
 constexpr Quantity kQuantities[] = {
-    {"DC", "DopplerCentroid", "NO DC poly available", true},
-    {"FR", "DopplerRate", "NO FR poly available", true},
-    {"SL2GR", "SlantToGround", "NO SL2GR poly available", false},
-    {"GR2SL", "GroundToSlant", "NO GR2SL poly available", false},
-    {"SL2THETA", "SlantToTheta", "NO SL2THETA poly available", false},
-    {"SL2PHI", "SlantToPhi", "NO SL2PHI poly available", false},
+    {"DopplerCentroid", "NO DC poly available", true, {"DCpoly", "DCpoly_rgt0", "DCpoly_azt0"}},
+    // The files have a capital P in the range key alone.
+    {"DopplerRate", "NO FR poly available", true, {"FRpoly", "FRPoly_rgt0", "FRpoly_azt0"}},
+    {"SlantToGround", "NO SL2GR poly available", false, {"SL2GRpoly", "SL2GRpoly_rgt0", "SL2GRpoly_azt0"}},
+    {"GroundToSlant", "NO GR2SL poly available", false, {"GR2SLpoly", "GR2SLpoly_rgt0", "GR2SLpoly_azt0"}},
+    {"SlantToTheta",
+     "NO SL2THETA poly available",
+     false,
+     {"SL2THETApoly", "SL2THETApoly_rgt0", "SL2THETApoly_azt0"}},
+    {"SlantToPhi", "NO SL2PHI poly available", false, {"SL2PHIpoly", "SL2PHIpoly_rgt0", "SL2PHIpoly_azt0"}},
 };
+
+int read_poly(poly& object, const char* file, const char* name, const Quantity& quantity) {
+    if (object.poly::readpar(file, name) == QUO_OK) return QUO_OK;
+    return plain::kTable.of(object).read_profile(file, name, quantity.keys);
+}
 
 /** One list, ordered by reference azimuth time. */
 template <typename P>
@@ -247,8 +241,7 @@ bool file_can_hold(const polySAR& set, const char* file) {
 
 }  // namespace
 
-poly::poly() { createElementsVector(plain::kTable.size()); }
-void poly::refreshParameters() { plain::kTable.register_all(*this); }
+QUO_RECORD(poly, plain::kTable)
 int poly::clone(poly* to) const { return plain::kTable.copy(*this, *to); }
 int poly::EvaluatePoly(double rangeTime, double azimuthTime, double* value) const {
     *value = value_around(pol, rangeTime - trg0, azimuthTime - taz0);
@@ -259,21 +252,6 @@ int poly::writepar(const char* file, const char* name) {
 }
 int poly::readpar(const char* file, const char* name) {
     return readAuxiliaryFile(file, 1, section_of(name).c_str()) ? QUO_OK : QUO_REFUSED;
-}
-
-int polyDC::readpar(const char* file, const char* name) { return plain::read(*this, file, name, plain::kDC); }
-int polyFR::readpar(const char* file, const char* name) { return plain::read(*this, file, name, plain::kFR); }
-int polySL2GR::readpar(const char* file, const char* name) {
-    return plain::read(*this, file, name, plain::kSL2GR);
-}
-int polyGR2SL::readpar(const char* file, const char* name) {
-    return plain::read(*this, file, name, plain::kGR2SL);
-}
-int polySL2THETA::readpar(const char* file, const char* name) {
-    return plain::read(*this, file, name, plain::kSL2THETA);
-}
-int polySL2PHI::readpar(const char* file, const char* name) {
-    return plain::read(*this, file, name, plain::kSL2PHI);
 }
 
 int polyDC::readparold(const char* file, const char* section) {
@@ -305,7 +283,7 @@ int polyFR::readparold(const char* file, const char* section, int n) {
     if (n == 3 && read_doubles(section, "AzimuthCoeff", a3, 3, file)) {
         pol[0] = a3[0];
         pol[1] = a3[1];
-        pol[3] = a3[2];  // deliberate: the cross term, not x^2
+        pol[3] = a3[2];  // the third one is that of x y
         return QUO_OK;
     }
     if (n == 7 && read_doubles(section, "DopRatRangeCoeff", a7, 7, file)) {
@@ -315,8 +293,7 @@ int polyFR::readparold(const char* file, const char* section, int n) {
     return QUO_REFUSED;
 }
 
-extended_poly::extended_poly() { createElementsVector(extended::kTable.size()); }
-void extended_poly::refreshParameters() { extended::kTable.register_all(*this); }
+QUO_RECORD(extended_poly, extended::kTable)
 int extended_poly::clone(extended_poly* to) const { return extended::kTable.copy(*this, *to); }
 int extended_poly::EvaluatePoly(double rangeTime, double azimuthTime, double* value) const {
     const double x = rangeTime - trg0, y = azimuthTime - taz0;
@@ -326,8 +303,7 @@ int extended_poly::EvaluatePoly(double rangeTime, double azimuthTime, double* va
     return QUO_OK;
 }
 
-polySAR::polySAR() { createElementsVector(counts::kTable.size()); }
-void polySAR::refreshParameters() { counts::kTable.register_all(*this); }
+QUO_RECORD(polySAR, counts::kTable)
 
 int polySAR::CreatePolys(int dc, int fr, int sl2gr, int gr2sl, int sl2theta, int sl2phi) {
     quo::CallFrame frame{"polySAR::CreatePolys", kSource};
@@ -356,6 +332,9 @@ int polySAR::DestroyPolys() {
 
 // The operations of one quantity: the list, and the names that its frames carry.
 #define QUO_POLY_OPERATIONS(KIND, index, count)                                                                 \
+    int poly##KIND::readpar(const char* file, const char* name) {                                               \
+        return read_poly(*this, file, name, kQuantities[index]);                                                \
+    }                                                                                                           \
     int polySAR::Evaluate##KIND(double r, double a, double* value) const {                                      \
         return evaluate_selected("polySAR::Evaluate" #KIND, List{*this, index, KIND, count}, r, a, value);      \
     }                                                                                                           \
