@@ -28,10 +28,14 @@ std::string value_text(const parElement& element, int index) {
     });
 }
 
+std::string value_defect(const parElement& element, const parElement& fresh, int index, std::string_view text) {
+    return is_unknown(fresh, index, text) ? "" : element.defect(text);
+}
+
 std::string values_defect(const parElement& element, const parElement& fresh, std::span<const std::string> texts) {
     int index = 0;
     for (const std::string& text : texts) {
-        std::string defect = is_unknown(fresh, index++, text) ? "" : element.defect(text);
+        std::string defect = value_defect(element, fresh, index++, text);
         if (!defect.empty()) return defect;
     }
     return element.countDefect(texts.size());

@@ -11,8 +11,11 @@
 
 namespace tool {
 
-/** What is wrong with the values of a field, their number included, or nothing. What a new object holds in a
- * value's place, "NOT_AVAILABLE", and -999 where it is no count, mark a value that is not known. */
+/** What is wrong with one value of a field, or nothing. What a new object holds in its place, "NOT_AVAILABLE", and
+ * -999 where it is no count, mark a value that is not known. */
+std::string value_defect(const parElement& element, const parElement& fresh, int index, std::string_view text);
+
+/** The same for all values of a field, their number included. */
 std::string values_defect(const parElement& element, const parElement& fresh, std::span<const std::string> texts);
 
 /** Calls `use` with a value in memory: a double, as a header would hold it, an int or a text. */

@@ -139,10 +139,10 @@ private:
         }
     }
     void check_element(const parElement& element, const parElement& fresh) {
-        std::vector<std::string> texts;
-        for (int i = 0; i < element.count; ++i) texts.push_back(value_text(element, i));
-        const std::string defect = values_defect(element, fresh, texts);
-        if (!defect.empty()) error(element.section, element.name, defect);
+        for (int i = 0; i < element.count; ++i) {
+            const std::string defect = value_defect(element, fresh, i, value_text(element, i));
+            if (!defect.empty()) return error(element.section, element.name, defect);
+        }
     }
 
     // What the description says of the rest of the product.
