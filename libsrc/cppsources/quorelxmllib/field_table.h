@@ -353,13 +353,13 @@ FieldTable(const char*, Row<Owner>, Rest...) -> FieldTable<Owner, 1 + sizeof...(
 
 /** What a class with a table defines: how it is made and registered, and where a header holds it as one section,
  * how it is copied, read and written too. */
-#define QUO_RECORD(Class, table)                           \
-    Class::Class() { createElementsVector(table.size()); } \
-    void Class::refreshParameters() { table.register_all(*this); }
-#define QUO_HEADER_RECORD(Class, table)                                      \
-    QUO_RECORD(Class, table)                                                 \
-    int Class::clone(Class* to) const { return table.copy(*this, *to); }     \
-    int Class::readhdr(const char* file) { return table.read(*this, file); } \
-    int Class::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, table.section()); }
+#define QUO_RECORD(Class, table)                             \
+    Class::Class() { createElementsVector((table).size()); } \
+    void Class::refreshParameters() { (table).register_all(*this); }
+#define QUO_HEADER_RECORD(Class, table)                                        \
+    QUO_RECORD(Class, table)                                                   \
+    int Class::clone(Class* to) const { return (table).copy(*this, *to); }     \
+    int Class::readhdr(const char* file) { return (table).read(*this, file); } \
+    int Class::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, (table).section()); }
 
 #endif
