@@ -358,6 +358,7 @@ FieldTable(const char*, Row<Owner>, Rest...) -> FieldTable<Owner, 1 + sizeof...(
     void Class::refreshParameters() { (table).register_all(*this); }
 #define QUO_HEADER_RECORD(Class, table)                                        \
     QUO_RECORD(Class, table)                                                   \
+    /* NOLINTNEXTLINE(bugprone-macro-parentheses): a type takes none */        \
     int Class::clone(Class* to) const { return (table).copy(*this, *to); }     \
     int Class::readhdr(const char* file) { return (table).read(*this, file); } \
     int Class::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, (table).section()); }
