@@ -58,8 +58,9 @@ class QUO_BASE_API polyFR : public poly {
 public:
     int readpar(const char* file, const char* name);  ///< XML form, else the keys above; 0 or 1
     /** Older parameter-file forms, n coefficients; reference times are not read. n = 5: AzimuthCoeff as a pure
-     * range polynomial (c0, c1, c4, c5, c6, the others 0). n = 3: AzimuthCoeff into c0, c1 and, deliberately, c3,
-     * the others stay. n = 7: DopRatRangeCoeff into c0 .. c6. 0, or 1 when the key is missing or for any other n.
+     * range polynomial (c0, c1, c4, c5, c6, the others 0). n = 3: AzimuthCoeff into c0, c1 and c3, the term in x
+     * y, the others stay. n = 7: DopRatRangeCoeff into c0 .. c6. 0, or 1 when the key is missing or for any other
+     * n.
      */
     int readparold(const char* file, const char* section, int n);
 };
@@ -88,7 +89,7 @@ public:
 
 /** The higher-order form: e0 + e1 x + e2 y + e3 x y + e4 y^2 + e5 x y + e6 x y^2 + e7 x^2 y + e8 x^3 + e9 x^4 +
  * e10 x^5
- * + e11 y^3 + e12 y^4 + e13 y^5. Deliberate: x y stands twice and there is no x^2, as in the stored sets. */
+ * + e11 y^3 + e12 y^4 + e13 y^5. x y stands twice and there is no x^2: stored sets were fitted so. */
 class QUO_BASE_API extended_poly : public poly {
 public:
     extended_poly();
@@ -109,7 +110,7 @@ class QUO_BASE_API extended_polyFR : public extended_poly {};
 
 /** The polynomials of a product: for each of six quantities a list, ordered by increasing taz0 (nothing sorts it).
  *
- * Selection takes the first polynomial whose taz0 is at or after the azimuth time, deliberately not the nearest,
+ * Selection takes the first polynomial whose taz0 is at or after the azimuth time, which need not be the nearest,
  * or the last one. Interpolation blends the coefficients of the two around the azimuth time, about the reference
  * point of the earlier one; outside the list the Doppler centroid and FM rate go on linearly, the other four stay
  * at the end's coefficients. An empty list gives 10 and the ERROR entry "NO DC poly available" (FR, SL2GR, GR2SL,

@@ -97,7 +97,7 @@ public:
      * bytes into the latter is the offset of the data set, of 171648 bytes. From its byte 171232 on it has 68
      * bytes per swath: the temperature as a float and the gains as doubles, all big-endian.
      * @param annex_file  name of the file
-     * @param swath       0 to 4; deliberate: any other leaves both members as they are, with 0
+     * @param swath       0 to 4; any other has no gains: both members stay as they are, with 0
      * @return 0; 1 for an offset that is no number or negative; 4 for a file that is too short; 7; 9. Members
      * change with 0 only. */
     int getDroopGain(const char* annex_file, int swath);
@@ -138,12 +138,12 @@ protected:
 class QUO_BASE_API QuickLook_Obj : public GeneralSAR_Base {
 public:
     QuickLook_Obj();
-    /** XML section only. Deliberate: returns 0 whatever happens; members that could not be read keep their values.
-     */
+    /** XML section only. A product without a quick-look is as good as one with: returns 0 whatever happens;
+     * members that could not be read keep their values. */
     int readhdr(const char* file) override;
     int writehdr(const char* file) override;  ///< replaces the section in the file; 0 or 1
-    /** Copies first sample, first line, samples and lines. Deliberate: the two multilook factors of the target
-     * stay. Returns 0. */
+    /** Copies first sample, first line, samples and lines: the part of the image. The two multilook factors of the
+     * target stay its own. Returns 0. */
     int clone(QuickLook_Obj* to) const;
 
     int QL_FirstSample = 0;  ///< first sample shown, counted from 0
@@ -168,7 +168,8 @@ public:
     using GeneralSAR_Base::writehdr;
     /** Reads the XML section, else the parameter file, into Point, and Point into the named members.
      *
-     * @return 0. Deliberate: also where neither could be read; the named members then become what Point held. */
+     * @return 0, also where neither could be read: a point may be missing from a grid. The named members then
+     * become what Point held. */
     int readhdr(const char* file, const char* point);
     /** Copies the named members into Point and replaces the point's section in the file; 0 or 1. */
     int writehdr(const char* file, const char* point);

@@ -117,7 +117,7 @@ public:
     /** Number of the polarization: "H/H" 0, "V/V" 1, "H/V" 2, "V/H" 3, anything else kUnknownNumber. */
     int getPolarizationNbr() const;
     /** Number of the swath: "IS1" to "IS7" 0 to 6, "SS2" to "SS5" 2 to 5, anything else kUnknownNumber.
-     * Deliberate: "SS1" is 7, and the other wide swaths share their numbers with "IS3" to "IS6". */
+     * "SS1" is 7, not the 1 of "IS2", and the other wide swaths share their numbers with "IS3" to "IS6". */
     int getISNbr() const;
 
     char OrbitNumber[512] = "NOT_AVAILABLE";         ///< number of the orbit

@@ -81,7 +81,7 @@ public:
      *         stops no other. */
     int GSclone(GeneralSAR* other);
     /** Releases polynomials, state vectors (of both objects), and the arrays of swath and antenna pattern.
-     * Deliberate: the presence flags stay. Returns 0. */
+     * The presence flags stay: whoever destroys content disables the objects. Returns 0. */
     int GSdestroy();
 
     GSDataFile_Obj dataFile;                  ///< description of the product's raster, by the header's name

@@ -37,7 +37,7 @@ public:
 
     /** Reads the shared parameters from a section of a file; missing ones stay as they are. Returns 0. */
     int readConf(const char* file, int channel, const char* section);
-    /** Deliberate: the shared parameters are input only, so nothing is written. Returns 0. */
+    /** Writes nothing: the shared parameters are input only, set by hand for all processors. Returns 0. */
     int writeConf(const char* file, int channel, const char* section);
 
     /** A shared parameter by its index, described like an element of a header object; it points into this object.
@@ -227,8 +227,8 @@ enum GScObject {
     gscEnvisatCalibrationFactors = 5
 };
 
-/** Records that are read and written together. A record takes part while it is enabled. Deliberate: the
- * DemExtractorConf has no selector and takes no part. */
+/** Records that are read and written together. A record takes part while it is enabled. The
+ * DemExtractorConf has no selector and takes no part: it is read and written by itself. */
 class QUO_BASE_API GeneralSAR_configuration {
 public:
     GeneralSAR_configuration();

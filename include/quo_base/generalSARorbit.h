@@ -94,7 +94,6 @@ private:
     std::unique_ptr<double[]> polynomials_;  // x, y, z of the positions, then of the velocities, vectors_ each
     std::int32_t vectors_ = 0;               // that the arrays have room for
     bool fitted_ = false;
-    int buffer_status_ = 0;  // of the last createBuffers(), which readers cannot pass on
 };
 
 /** What SVCheck() found wrong with the state vectors. */
@@ -402,7 +401,6 @@ private:
     std::int32_t vectors_ = 0;                // that the arrays have room for
     double lambda_ = 0.05623564240544047;
     std::int32_t look_sign_ = 1;
-    int buffer_status_ = 0;  // of the last createBuffers(), which readers cannot pass on
     double position_[3] = {}, velocity_[3] = {}, point_[3] = {};
 };
 

@@ -53,8 +53,8 @@ public:
     /** Reads the side file of the header's raster. 0 whatever it holds, so that a product always has this entry;
      * a side file that could not be read whole leaves its entries in the report. 7 where memory is short. */
     int readhdr(const char* file) override;
-    /** Writes the side file of the header's raster; File keeps its own name. Deliberate: returns 0 even where
-     * nothing could be written; the report tells. */
+    /** Writes the side file of the header's raster; File keeps its own name. A header is written without its
+     * raster too: returns 0 even where nothing could be written; the report tells. */
     int writehdr(const char* file) override;
     using GeneralSAR_Base::writehdr;
     int clone(GSDataFile_Obj* to) const;  ///< copies name and description, opens nothing; 0 or a failing close

@@ -43,7 +43,7 @@
 
 namespace quo {
 class HeaderDocument;
-struct RegistryAccess;
+class Record;
 }  // namespace quo
 
 /** One header document in memory. */
@@ -171,7 +171,6 @@ protected:
     int insertInstruction(const char* name, const char* content) noexcept;
 
 private:
-    friend struct quo::RegistryAccess;
     friend class GeneralSAR_BaseXML;
 
     struct __attribute__((visibility("hidden"))) Mirror;
@@ -239,6 +238,9 @@ public:
     std::size_t room = kTextRoom;   ///< room of each text
     bool text_array = false;        ///< `pointer` is an array of texts, whatever the count
     parRule rule;                   ///< for defect() alone; reading and writing do not look at it
+    const char* section = "";       ///< section that objects of the class usually stand in; empty where not told
+    const char* unit = "";          ///< unit of the values, empty where they have none or it is not told
+    const char* meaning = "";       ///< what the values are, or empty
 
     /** Describes the element anew. Before the first registration a count of 1 makes it a scalar. Returns 0. */
     int setElement(const char* element_name, void* values, ParameterType value_type, std::int32_t value_count,
@@ -343,8 +345,11 @@ protected:
     bool sourceCanHold(std::int64_t count) const noexcept;
 
 private:
-    friend struct quo::RegistryAccess;
+    friend class quo::Record;
 
+    std::span<const parElement> elements() const noexcept {
+        return {elements_, static_cast<std::size_t>(element_count_)};
+    }
     int addElement(const char* name, void* values, parElement::ParameterType type, int count, double minimum,
                    double maximum, bool mandatory);
     int attach(const char* file);
@@ -362,8 +367,9 @@ private:
     parElement* elements_ = nullptr;  // owned while list_owned_ is set
     bool allocated_ = false;
     bool list_owned_ = true;
-    bool table_refused_ = false;  // no memory for the table: the object can neither be read nor written
-    std::int32_t unread_ = 0;     // 4 or 7 when the last read of a file failed for that, else 0
+    bool table_refused_ = false;   // no memory for the table: the object can neither be read nor written
+    bool out_of_buffers_ = false;  // the last read found no memory for the arrays
+    std::int32_t unread_ = 0;      // 4 or 7 when the last read of a file failed for that, else 0
     quorelxml document_;
     std::int32_t channel_ = 0;
     std::string section_;

@@ -40,7 +40,7 @@ public:
     int GetFastRange(double length) const;
     int GetSlowRange(double length) const;
 
-    /** The corners. Deliberate: up and down move along the fast axis, left and right along the slow axis, so that
+    /** The corners. Up and down move along the fast axis, left and right along the slow axis, so that
      * the upper right corner is the first sample of the last line. */
     ROI_Time GetUpLeft() const;
     ROI_Time GetUpRight() const;
@@ -51,7 +51,7 @@ public:
     /** Reads the region from the section `name` of an XML header (channel 1), else from the section of that name
      * of a parameter file with the members' names as keys.
      *
-     * @return 0 or 1. Deliberate: in a parameter file the key Samples alone decides; any other key that is missing
+     * @return 0 or 1. In a parameter file the key Samples alone decides; any other key that is missing
      * leaves its member as it was. */
     int read_roi(const char* file, const char* name);
     /** Writes the region as the section `name` of an XML header (channel 1), which replaces an older one. Returns

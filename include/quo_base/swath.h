@@ -64,9 +64,6 @@ public:
 
 protected:
     void refreshParameters() override;
-
-private:
-    int buffer_status_ = 0;  // of the last createBuffers(), which readers cannot pass on
 };
 
 /** The elevation antenna pattern: its angles in the section "AntennaPattern", its samples as one line of floats in
@@ -123,9 +120,6 @@ public:
 
 protected:
     void refreshParameters() override;
-
-private:
-    int buffer_status_ = 0;  // of the last createBuffers(), which readers cannot pass on
 };
 
 #endif

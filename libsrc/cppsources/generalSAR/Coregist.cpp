@@ -82,8 +82,7 @@ int make_samples(Coregist& fit, const Grid& master, const Grid& slave) {
 
 }  // namespace
 
-Coregist::Coregist() { createElementsVector(kTable.size()); }
-void Coregist::refreshParameters() { kTable.register_all(*this); }
+QUO_RECORD(Coregist, kTable)
 
 int Coregist::clone(Coregist* to) const {
     const int status = kTable.copy(*this, *to);
@@ -93,14 +92,14 @@ int Coregist::clone(Coregist* to) const {
 
 int Coregist::readpar(const char* file) {
     quo::CallFrame frame{"Coregist::readpar", kSource};
-    const bool found = readAuxiliaryFile(file, 1, kTable.section()) || kTable.read_profile(*this, file) == QUO_OK;
+    const bool found = kTable.read(*this, file) == QUO_OK;
     init();
     if (!found) return frame.fail(QUO_REFUSED, "Fit polynomials read error");
     return frame.success();
 }
 
 int Coregist::writepar(const char* file) {
-    writeAuxiliaryFile(file, 1, kTable.section());  // deliberate: the outcome stands in the report alone
+    writeAuxiliaryFile(file, 1, kTable.section());  // callers rely on 0: the outcome stands in the report alone
     return QUO_OK;
 }
 

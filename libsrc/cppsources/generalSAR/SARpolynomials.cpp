@@ -1,6 +1,7 @@
 #include "quo_base/SARpolynomials.h"
 
 #include <algorithm>
+#include <array>
 #include <cstddef>
 #include <iterator>
 #include <new>
@@ -39,24 +40,8 @@ constexpr std::int64_t kShortestPolynomial = 40;
 
 namespace plain {
 using Obj = poly;
-/** The fields of a polynomial with one quantity's parameter-file keys. */
-constexpr auto table(const char* coefficients, const char* range, const char* azimuth) {
-    return quo::FieldTable{kSetSection, QUO_FIELD(pol, coefficients),
-                           QUO_FIELD(trg0, quo::element("trg0_s"), range),
-                           QUO_FIELD(taz0, quo::element("taz0_s"), azimuth)};
-}
-using Table = decltype(table("", "", ""));
-constexpr Table kTable = table("pol", "trg0_s", "taz0_s");
-constexpr Table kDC = table("DCpoly", "DCpoly_rgt0", "DCpoly_azt0");
-constexpr Table kFR = table("FRpoly", "FRPoly_rgt0", "FRpoly_azt0");  // deliberate: the capital P of the range key
-constexpr Table kSL2GR = table("SL2GRpoly", "SL2GRpoly_rgt0", "SL2GRpoly_azt0");
-constexpr Table kGR2SL = table("GR2SLpoly", "GR2SLpoly_rgt0", "GR2SLpoly_azt0");
-constexpr Table kSL2THETA = table("SL2THETApoly", "SL2THETApoly_rgt0", "SL2THETApoly_azt0");
-constexpr Table kSL2PHI = table("SL2PHIpoly", "SL2PHIpoly_rgt0", "SL2PHIpoly_azt0");
-
-int read(poly& object, const char* file, const char* name, const Table& table) {
-    return object.poly::readpar(file, name) == QUO_OK ? QUO_OK : table.read_profile(object, file, name);
-}
+constexpr quo::FieldTable kTable{kSetSection, QUO_FIELD(pol), QUO_FIELD(trg0, quo::element("trg0_s")),
+                                 QUO_FIELD(taz0, quo::element("taz0_s"))};
 }  // namespace plain
 
 namespace extended {
@@ -85,17 +70,31 @@ bool read_doubles(const char* section, const char* key, double* values, int coun
 
 /** What tells the six lists apart. */
 struct Quantity {
-    const char *name, *file_name, *none;
+    const char *file_name, *none;
     bool extrapolates;
+    const char* keys[3];  // of the fields of one polynomial in a parameter file
 };
 constexpr Quantity kQuantities[] = {
-    {"DC", "DopplerCentroid", "NO DC poly available", true},
-    {"FR", "DopplerRate", "NO FR poly available", true},
-    {"SL2GR", "SlantToGround", "NO SL2GR poly available", false},
-    {"GR2SL", "GroundToSlant", "NO GR2SL poly available", false},
-    {"SL2THETA", "SlantToTheta", "NO SL2THETA poly available", false},
-    {"SL2PHI", "SlantToPhi", "NO SL2PHI poly available", false},
+    {"DopplerCentroid", "NO DC poly available", true, {"DCpoly", "DCpoly_rgt0", "DCpoly_azt0"}},
+    // The files have a capital P in the range key alone.
+    {"DopplerRate", "NO FR poly available", true, {"FRpoly", "FRPoly_rgt0", "FRpoly_azt0"}},
+    {"SlantToGround", "NO SL2GR poly available", false, {"SL2GRpoly", "SL2GRpoly_rgt0", "SL2GRpoly_azt0"}},
+    {"GroundToSlant", "NO GR2SL poly available", false, {"GR2SLpoly", "GR2SLpoly_rgt0", "GR2SLpoly_azt0"}},
+    {"SlantToTheta",
+     "NO SL2THETA poly available",
+     false,
+     {"SL2THETApoly", "SL2THETApoly_rgt0", "SL2THETApoly_azt0"}},
+    {"SlantToPhi", "NO SL2PHI poly available", false, {"SL2PHIpoly", "SL2PHIpoly_rgt0", "SL2PHIpoly_azt0"}},
 };
+
+int read_poly(poly& object, const char* file, const char* name, const Quantity& quantity) {
+    if (object.poly::readpar(file, name) == QUO_OK) return QUO_OK;
+    return plain::kTable.of(object).read_profile(file, name, quantity.keys);
+}
+
+double value_around(const double* c, double x, double y) {
+    return c[0] + c[1] * x + c[2] * y + c[3] * x * y + x * x * (c[4] + x * (c[5] + x * c[6]));
+}
 
 /** One list, ordered by reference azimuth time. */
 template <typename P>
@@ -119,8 +118,12 @@ public:
         if (next == 0) return 0;
         return azimuth >= p_.back().taz0 ? p_.size() - 1 : std::min(next, p_.size()) - 1;
     }
-    [[nodiscard]] const P& operator[](std::size_t i) const { return p_[i]; }
-
+    [[nodiscard]] double interpolated(double range, double azimuth) const {
+        double c[7];
+        coefficients(azimuth, c);
+        const P& origin = p_[earlier(azimuth)];
+        return value_around(c, range - origin.trg0, azimuth - origin.taz0);
+    }
     void coefficients(double azimuth, double* c) const {
         if (p_.size() == 1) return copy(p_[0], c);
         if (azimuth < p_.front().taz0) {
@@ -156,99 +159,77 @@ private:
     std::span<const P> p_;
 };
 
-/** Calls `see(index, list, count)` for the six lists in their order, until it returns a status other than 0. */
-template <typename Set, typename See>
-int each_list(Set& set, See see) {
+/** Calls `see(index, list, count)` with the members of a set that hold the six lists and their lengths, in their
+ * order, until it returns a status other than 0. */
+template <typename See>
+int each_list(See see) {
+    using Set = polySAR;
     int status = QUO_OK;
-    static_cast<void>((status = see(0U, set.DC, set.ndc)) || (status = see(1U, set.FR, set.nfr)) ||
-                      (status = see(2U, set.SL2GR, set.nsl2gr)) || (status = see(3U, set.GR2SL, set.ngr2sl)) ||
-                      (status = see(4U, set.SL2THETA, set.nsl2theta)) ||
-                      (status = see(5U, set.SL2PHI, set.nsl2phi)));
+    static_cast<void>(
+        (status = see(0U, &Set::DC, &Set::ndc)) || (status = see(1U, &Set::FR, &Set::nfr)) ||
+        (status = see(2U, &Set::SL2GR, &Set::nsl2gr)) || (status = see(3U, &Set::GR2SL, &Set::ngr2sl)) ||
+        (status = see(4U, &Set::SL2THETA, &Set::nsl2theta)) || (status = see(5U, &Set::SL2PHI, &Set::nsl2phi)));
     return status;
 }
 
-/** Lowers every count to what its list really holds. */
-void settle_counts(polySAR& set) {
-    each_list(set, [&set](std::size_t index, const auto& list, std::int32_t& count) {
-        count = quo::PolynomialLists::held(set, index, list.get(), count);
+using Counts = std::array<std::int32_t, std::size(kQuantities)>;
+
+/** How many polynomials the lists really hold. */
+Counts counts_of(const polySAR& set) {
+    Counts counts;
+    each_list([&](std::size_t index, auto list, auto count) {
+        counts[index] = quo::PolynomialLists::held(set, index, (set.*list).get(), set.*count);
         return QUO_OK;
+    });
+    return counts;
+}
+
+/** Makes lists of so many polynomials; false, with some of them made, when memory is short. */
+bool make_lists(polySAR& set, const Counts& wanted) {
+    return each_list([&](std::size_t index, auto list, auto count) {
+               const std::int32_t n = std::max(wanted[index], 0);
+               const bool made = quo::renew_array(set.*list, static_cast<std::size_t>(n));
+               set.*count = made ? n : 0;
+               quo::PolynomialLists::note(set, index, (set.*list).get(), set.*count);
+               return made ? QUO_OK : QUO_NO_MEMORY;
+           }) == QUO_OK;
+}
+
+/** Calls `use(polynomial, name)` for every polynomial with its name in a header, until it returns a status other
+ * than 0. */
+template <typename Use>
+int each_polynomial(polySAR& set, Use use) {
+    return each_list([&](std::size_t index, auto list, auto count) {
+        for (std::int32_t i = 0; i < set.*count; ++i) {
+            const std::string name = std::string{kQuantities[index].file_name} + '-' + std::to_string(i);
+            if (const int status = use((set.*list)[static_cast<std::size_t>(i)], name.c_str())) return status;
+        }
+        return 0;
     });
 }
 
-template <typename P>
-int evaluate_selected(const quo::SharedCall& function, const List<P>& list, double range, double azimuth,
-                      double* value) {
+/** One call of a quantity: `use(list)` gives its status. */
+template <typename P, typename Use>
+int with_list(const quo::SharedCall& function, const List<P>& list, Use use) {
     quo::CallFrame frame{function, kSource};
     if (list.empty()) return frame.fail(QUO_NUMERIC, list.quantity().none);
-    if (const int status = list.selected(azimuth).EvaluatePoly(range, azimuth, value)) return frame.callee(status);
-    return frame.success();
-}
-
-double value_around(const double* c, double x, double y) {
-    return c[0] + c[1] * x + c[2] * y + c[3] * x * y + x * x * (c[4] + x * (c[5] + x * c[6]));
-}
-
-template <typename P>
-int evaluate_interpolated(const quo::SharedCall& function, const List<P>& list, double range, double azimuth,
-                          double* value) {
-    quo::CallFrame frame{function, kSource};
-    if (list.empty()) return frame.fail(QUO_NUMERIC, list.quantity().none);
-    double c[7];
-    list.coefficients(azimuth, c);
-    const P& origin = list[list.earlier(azimuth)];
-    *value = value_around(c, range - origin.trg0, azimuth - origin.taz0);
-    return frame.success();
-}
-
-template <typename P>
-int get_coefficients(const quo::SharedCall& function, const List<P>& list, double azimuth, double* c) {
-    quo::CallFrame frame{function, kSource};
-    if (list.empty()) return frame.fail(QUO_NUMERIC, list.quantity().none);
-    list.coefficients(azimuth, c);
-    return frame.success();
-}
-
-template <typename P>
-int get_number(const quo::SharedCall& function, const List<P>& list, double azimuth, int* index) {
-    quo::CallFrame frame{function, kSource};
-    if (list.empty()) return frame.fail(QUO_NUMERIC, list.quantity().none);
-    *index = static_cast<int>(list.earlier(azimuth));
-    return frame.success();
-}
-
-/** Name of polynomial `index` of a list, as it stands in a header. */
-std::string polynomial_name(const Quantity& quantity, int index) {
-    return std::string{quantity.file_name} + '-' + std::to_string(index);
-}
-
-template <typename P>
-bool make_list(std::unique_ptr<P[]>& list, std::int32_t& count, int wanted) {
-    list.reset();
-    count = 0;
-    if (wanted < 1) return true;
-    try {
-        list = std::make_unique<P[]>(static_cast<std::size_t>(wanted));
-    } catch (const std::bad_alloc&) {
-        return false;
-    }
-    count = wanted;
-    return true;
+    const int status = use(list);
+    return status ? frame.callee(status) : frame.success();
 }
 
 bool file_can_hold(const polySAR& set, const char* file) {
     const auto bytes = quo::file_length(file);
     quo::Checked<std::int64_t> total = 0;
-    for (const std::int32_t count : {set.ndc, set.nfr, set.nsl2gr, set.ngr2sl, set.nsl2theta, set.nsl2phi}) {
-        if (count < 0) return false;
-        total += quo::Checked<std::int64_t>{count} * kShortestPolynomial;
-    }
-    return bytes && total.value() && *total.value() <= *bytes;
+    const int negative = each_list([&](std::size_t, auto, auto count) {
+        total += quo::Checked<std::int64_t>{set.*count} * kShortestPolynomial;
+        return set.*count < 0 ? 1 : 0;
+    });
+    return !negative && bytes && total.value() && *total.value() <= *bytes;
 }
 
 }  // namespace
 
-poly::poly() { createElementsVector(plain::kTable.size()); }
-void poly::refreshParameters() { plain::kTable.register_all(*this); }
+QUO_RECORD(poly, plain::kTable)
 int poly::clone(poly* to) const { return plain::kTable.copy(*this, *to); }
 int poly::EvaluatePoly(double rangeTime, double azimuthTime, double* value) const {
     *value = value_around(pol, rangeTime - trg0, azimuthTime - taz0);
@@ -259,21 +240,6 @@ int poly::writepar(const char* file, const char* name) {
 }
 int poly::readpar(const char* file, const char* name) {
     return readAuxiliaryFile(file, 1, section_of(name).c_str()) ? QUO_OK : QUO_REFUSED;
-}
-
-int polyDC::readpar(const char* file, const char* name) { return plain::read(*this, file, name, plain::kDC); }
-int polyFR::readpar(const char* file, const char* name) { return plain::read(*this, file, name, plain::kFR); }
-int polySL2GR::readpar(const char* file, const char* name) {
-    return plain::read(*this, file, name, plain::kSL2GR);
-}
-int polyGR2SL::readpar(const char* file, const char* name) {
-    return plain::read(*this, file, name, plain::kGR2SL);
-}
-int polySL2THETA::readpar(const char* file, const char* name) {
-    return plain::read(*this, file, name, plain::kSL2THETA);
-}
-int polySL2PHI::readpar(const char* file, const char* name) {
-    return plain::read(*this, file, name, plain::kSL2PHI);
 }
 
 int polyDC::readparold(const char* file, const char* section) {
@@ -305,7 +271,7 @@ int polyFR::readparold(const char* file, const char* section, int n) {
     if (n == 3 && read_doubles(section, "AzimuthCoeff", a3, 3, file)) {
         pol[0] = a3[0];
         pol[1] = a3[1];
-        pol[3] = a3[2];  // deliberate: the cross term, not x^2
+        pol[3] = a3[2];  // the third one is that of x y
         return QUO_OK;
     }
     if (n == 7 && read_doubles(section, "DopRatRangeCoeff", a7, 7, file)) {
@@ -315,8 +281,7 @@ int polyFR::readparold(const char* file, const char* section, int n) {
     return QUO_REFUSED;
 }
 
-extended_poly::extended_poly() { createElementsVector(extended::kTable.size()); }
-void extended_poly::refreshParameters() { extended::kTable.register_all(*this); }
+QUO_RECORD(extended_poly, extended::kTable)
 int extended_poly::clone(extended_poly* to) const { return extended::kTable.copy(*this, *to); }
 int extended_poly::EvaluatePoly(double rangeTime, double azimuthTime, double* value) const {
     const double x = rangeTime - trg0, y = azimuthTime - taz0;
@@ -326,58 +291,61 @@ int extended_poly::EvaluatePoly(double rangeTime, double azimuthTime, double* va
     return QUO_OK;
 }
 
-polySAR::polySAR() { createElementsVector(counts::kTable.size()); }
-void polySAR::refreshParameters() { counts::kTable.register_all(*this); }
+QUO_RECORD(polySAR, counts::kTable)
 
 int polySAR::CreatePolys(int dc, int fr, int sl2gr, int gr2sl, int sl2theta, int sl2phi) {
     quo::CallFrame frame{"polySAR::CreatePolys", kSource};
-    const int wanted[] = {dc, fr, sl2gr, gr2sl, sl2theta, sl2phi};
-    const int* next = wanted;
-    const int status = each_list(*this, [&](std::size_t index, auto& list, std::int32_t& count) {
-        const bool made = make_list(list, count, *next++);
-        quo::PolynomialLists::note(*this, index, list.get(), count);
-        return made ? QUO_OK : QUO_NO_MEMORY;
-    });
-    if (status != QUO_OK) {
-        DestroyPolys();
-        return frame.fail(status, "Memory allocation failure");
-    }
-    return frame.success();
+    if (make_lists(*this, {dc, fr, sl2gr, gr2sl, sl2theta, sl2phi})) return frame.success();
+    DestroyPolys();
+    return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
 }
 int polySAR::CreatePolys(int dc, int fr) { return CreatePolys(dc, fr, 0, 0, 0, 0); }
 
 int polySAR::DestroyPolys() {
-    return each_list(*this, [](std::size_t, auto& list, std::int32_t& count) {
-        list.reset();
-        count = 0;
+    return each_list([this](std::size_t, auto list, auto count) {
+        (this->*list).reset();
+        this->*count = 0;
         return QUO_OK;
     });
 }
 
 // The operations of one quantity: the list, and the names that its frames carry.
-#define QUO_POLY_OPERATIONS(KIND, index, count)                                                                 \
-    int polySAR::Evaluate##KIND(double r, double a, double* value) const {                                      \
-        return evaluate_selected("polySAR::Evaluate" #KIND, List{*this, index, KIND, count}, r, a, value);      \
-    }                                                                                                           \
-    double polySAR::Evaluate##KIND(double r, double a) const {                                                  \
-        double value = 0.0;                                                                                     \
-        Evaluate##KIND(r, a, &value);                                                                           \
-        return value;                                                                                           \
-    }                                                                                                           \
-    int polySAR::Evaluate##KIND##interp(double r, double a, double* value) const {                              \
-        return evaluate_interpolated("polySAR::Evaluate" #KIND "interp", List{*this, index, KIND, count}, r, a, \
-                                     value);                                                                    \
-    }                                                                                                           \
-    double polySAR::Evaluate##KIND##interp(double r, double a) const {                                          \
-        double value = 0.0;                                                                                     \
-        Evaluate##KIND##interp(r, a, &value);                                                                   \
-        return value;                                                                                           \
-    }                                                                                                           \
-    int polySAR::get##KIND##poly(double a, double* c) const {                                                   \
-        return get_coefficients("polySAR::get" #KIND "poly", List{*this, index, KIND, count}, a, c);            \
-    }                                                                                                           \
-    int polySAR::get##KIND##num(double a, int* number) const {                                                  \
-        return get_number("polySAR::get" #KIND "num", List{*this, index, KIND, count}, a, number);              \
+#define QUO_POLY_OPERATIONS(KIND, index, count)                                                                \
+    int poly##KIND::readpar(const char* file, const char* name) {                                              \
+        return read_poly(*this, file, name, kQuantities[index]);                                               \
+    }                                                                                                          \
+    int polySAR::Evaluate##KIND(double r, double a, double* value) const {                                     \
+        return with_list("polySAR::Evaluate" #KIND, List{*this, index, KIND, count},                           \
+                         [=](const auto& list) { return list.selected(a).EvaluatePoly(r, a, value); });        \
+    }                                                                                                          \
+    double polySAR::Evaluate##KIND(double r, double a) const {                                                 \
+        double value = 0.0;                                                                                    \
+        Evaluate##KIND(r, a, &value);                                                                          \
+        return value;                                                                                          \
+    }                                                                                                          \
+    int polySAR::Evaluate##KIND##interp(double r, double a, double* value) const {                             \
+        return with_list("polySAR::Evaluate" #KIND "interp", List{*this, index, KIND, count},                  \
+                         [=](const auto& list) {                                                               \
+                             *value = list.interpolated(r, a);                                                 \
+                             return QUO_OK;                                                                    \
+                         });                                                                                   \
+    }                                                                                                          \
+    double polySAR::Evaluate##KIND##interp(double r, double a) const {                                         \
+        double value = 0.0;                                                                                    \
+        Evaluate##KIND##interp(r, a, &value);                                                                  \
+        return value;                                                                                          \
+    }                                                                                                          \
+    int polySAR::get##KIND##poly(double a, double* c) const {                                                  \
+        return with_list("polySAR::get" #KIND "poly", List{*this, index, KIND, count}, [=](const auto& list) { \
+            list.coefficients(a, c);                                                                           \
+            return QUO_OK;                                                                                     \
+        });                                                                                                    \
+    }                                                                                                          \
+    int polySAR::get##KIND##num(double a, int* number) const {                                                 \
+        return with_list("polySAR::get" #KIND "num", List{*this, index, KIND, count}, [=](const auto& list) {  \
+            *number = static_cast<int>(list.earlier(a));                                                       \
+            return QUO_OK;                                                                                     \
+        });                                                                                                    \
     }
 QUO_POLY_OPERATIONS(DC, 0, ndc)
 QUO_POLY_OPERATIONS(FR, 1, nfr)
@@ -391,15 +359,14 @@ int polySAR::writehdr(const char* file) {
     quo::CallFrame frame{"polySAR::writehdr", kSource};
     return quo::guarded(frame, [&] {
         quo::JoinedSession session{file};
-        settle_counts(*this);
-        if (const int status = writeAuxiliaryFile(file, 1, kSetSection)) return frame.callee(status);
-        const int status = each_list(*this, [file](std::size_t index, auto& list, std::int32_t count) {
-            for (int i = 0; i < count; ++i) {
-                if (const int failed = list[i].writepar(file, polynomial_name(kQuantities[index], i).c_str()))
-                    return failed;
-            }
-            return 0;
+        const Counts counts = counts_of(*this);
+        each_list([&](std::size_t index, auto, auto count) {
+            this->*count = counts[index];
+            return QUO_OK;
         });
+        if (const int status = writeAuxiliaryFile(file, 1, kSetSection)) return frame.callee(status);
+        const int status =
+            each_polynomial(*this, [file](auto& each, const char* name) { return each.writepar(file, name); });
         if (status != QUO_OK) return frame.callee(status);
         if (const int saved = session.commit()) return frame.callee(saved);
         return frame.success();
@@ -412,7 +379,7 @@ int polySAR::readhdr(const char* file) {
         const quo::JoinedSession session{file};
         const quo::ProfileLook look{file};
         DestroyPolys();
-        if (!readAuxiliaryFile(file, 1, kSetSection) && counts::kTable.read_profile(*this, file) != QUO_OK) {
+        if (counts::kTable.read(*this, file) != QUO_OK) {
             DestroyPolys();
             return frame.silent(QUO_REFUSED);
         }
@@ -422,13 +389,8 @@ int polySAR::readhdr(const char* file) {
         }
         if (const int status = CreatePolys(ndc, nfr, nsl2gr, ngr2sl, nsl2theta, nsl2phi))
             return frame.callee(status);
-        const int status = each_list(*this, [file](std::size_t index, auto& list, std::int32_t count) {
-            for (int i = 0; i < count; ++i) {
-                if (const int failed = list[i].readpar(file, polynomial_name(kQuantities[index], i).c_str()))
-                    return failed;
-            }
-            return 0;
-        });
+        const int status =
+            each_polynomial(*this, [file](auto& each, const char* name) { return each.readpar(file, name); });
         if (status != QUO_OK) return frame.callee(status);
         return frame.success();
     });
@@ -437,21 +399,13 @@ int polySAR::readhdr(const char* file) {
 int polySAR::clone(polySAR* to) const {
     quo::CallFrame frame{"polySAR::clone", kSource};
     if (to == this) return frame.success();
-    std::int32_t counts[std::size(kQuantities)];
-    each_list(*this, [&](std::size_t index, const auto& list, std::int32_t count) {
-        counts[index] = quo::PolynomialLists::held(*this, index, list.get(), count);
-        return QUO_OK;
-    });
+    const Counts counts = counts_of(*this);
     if (const int status = to->CreatePolys(counts[0], counts[1], counts[2], counts[3], counts[4], counts[5]))
         return frame.callee(status);
-    const auto copy = [](const auto& from, auto& target, int count) {
-        for (int i = 0; i < count; ++i) from[i].clone(&target[i]);
-    };
-    copy(DC, to->DC, to->ndc);
-    copy(FR, to->FR, to->nfr);
-    copy(SL2GR, to->SL2GR, to->nsl2gr);
-    copy(GR2SL, to->GR2SL, to->ngr2sl);
-    copy(SL2THETA, to->SL2THETA, to->nsl2theta);
-    copy(SL2PHI, to->SL2PHI, to->nsl2phi);
+    each_list([&](std::size_t, auto list, auto count) {
+        for (std::size_t i = 0; i < static_cast<std::size_t>(to->*count); ++i)
+            (this->*list)[i].clone(&(to->*list)[i]);
+        return QUO_OK;
+    });
     return frame.success();
 }

@@ -98,6 +98,9 @@ constexpr quo::FieldTable kTable{
 namespace point {
 using Obj = geopoint;
 constexpr quo::FieldTable kTable{"GroundCornersPoints", QUO_FIELD(Point)};
+// The members that the values of Point belong to.
+constexpr double Obj::*kNamed[] = {&Obj::Latitude, &Obj::Longitude, &Obj::Height, &Obj::IncidenceAngle,
+                                   &Obj::LookAngle};
 constexpr const char* kProfileSection = "Coordinates";
 
 std::string section_of(const char* name) {
@@ -140,24 +143,9 @@ fcomplex sample_of(const Chirp& chirp, int n) {
 
 }  // namespace
 
-SamplingConstants_Obj::SamplingConstants_Obj() { createElementsVector(sampling::kTable.size()); }
-void SamplingConstants_Obj::refreshParameters() { sampling::kTable.register_all(*this); }
-int SamplingConstants_Obj::clone(SamplingConstants_Obj* to) const { return sampling::kTable.copy(*this, *to); }
-int SamplingConstants_Obj::writehdr(const char* file) {
-    return writeAuxiliaryFile(file, 1, sampling::kTable.section());
-}
-int SamplingConstants_Obj::readhdr(const char* file) {
-    return readAuxiliaryFile(file, 1, sampling::kTable.section()) ? QUO_OK
-                                                                  : sampling::kTable.read_profile(*this, file);
-}
+QUO_HEADER_RECORD(SamplingConstants_Obj, sampling::kTable)
 
-SARPulse_Obj::SARPulse_Obj() { createElementsVector(pulse::kTable.size()); }
-void SARPulse_Obj::refreshParameters() { pulse::kTable.register_all(*this); }
-int SARPulse_Obj::clone(SARPulse_Obj* to) const { return pulse::kTable.copy(*this, *to); }
-int SARPulse_Obj::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, pulse::kTable.section()); }
-int SARPulse_Obj::readhdr(const char* file) {
-    return readAuxiliaryFile(file, 1, pulse::kTable.section()) ? QUO_OK : pulse::kTable.read_profile(*this, file);
-}
+QUO_HEADER_RECORD(SARPulse_Obj, pulse::kTable)
 
 int SARPulse_Obj::chirpSamples() const {
     const auto chirp = chirp_of(*this);
@@ -196,23 +184,14 @@ int SARPulse_Obj::writeChirp(const char* file) const {
     return frame.success();
 }
 
-SensorAttitude_Obj::SensorAttitude_Obj() { createElementsVector(attitude::kTable.size()); }
-void SensorAttitude_Obj::refreshParameters() { attitude::kTable.register_all(*this); }
-int SensorAttitude_Obj::clone(SensorAttitude_Obj* to) const { return attitude::kTable.copy(*this, *to); }
-int SensorAttitude_Obj::writehdr(const char* file) {
-    return writeAuxiliaryFile(file, 1, attitude::kTable.section());
-}
-int SensorAttitude_Obj::readhdr(const char* file) {
-    return readAuxiliaryFile(file, 1, attitude::kTable.section()) ? QUO_OK
-                                                                  : attitude::kTable.read_profile(*this, file);
-}
+QUO_HEADER_RECORD(SensorAttitude_Obj, attitude::kTable)
 
 int SensorAttitude_Obj::getDroopGain(const char* annex_file, int swath) {
     quo::CallFrame frame{"SensorAttitude_Obj::getDroopGain", kSource};
     quo::TrackedBuffer<char> data{attitude::kAnnexData};
     if (!data) return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
     if (const int status = quo::read_annex_data(annex_file, data.data(), data.size())) return frame.callee(status);
-    // Deliberate: a swath that the file does not have is no failure.
+    // A swath that the file does not have is no failure: its gains stay unknown.
     if (swath < 0 || swath >= attitude::kAnnexSwaths) return frame.success();
 
     const char* record =
@@ -226,58 +205,40 @@ int SensorAttitude_Obj::getDroopGain(const char* annex_file, int swath) {
     return frame.success();
 }
 
-SpectralWindows_Obj::SpectralWindows_Obj() { createElementsVector(windows::kTable.size()); }
-void SpectralWindows_Obj::refreshParameters() { windows::kTable.register_all(*this); }
-int SpectralWindows_Obj::clone(SpectralWindows_Obj* to) const { return windows::kTable.copy(*this, *to); }
-int SpectralWindows_Obj::writehdr(const char* file) {
-    return writeAuxiliaryFile(file, 1, windows::kTable.section());
-}
-int SpectralWindows_Obj::readhdr(const char* file) {
-    return readAuxiliaryFile(file, 1, windows::kTable.section()) ? QUO_OK
-                                                                 : windows::kTable.read_profile(*this, file);
-}
+QUO_HEADER_RECORD(SpectralWindows_Obj, windows::kTable)
 
-QuickLook_Obj::QuickLook_Obj() { createElementsVector(quicklook::kTable.size()); }
-void QuickLook_Obj::refreshParameters() { quicklook::kTable.register_all(*this); }
+QUO_RECORD(QuickLook_Obj, quicklook::kTable)
 int QuickLook_Obj::clone(QuickLook_Obj* to) const {
     to->QL_FirstSample = QL_FirstSample;
     to->QL_FirstLine = QL_FirstLine;
     to->QL_Samples = QL_Samples;
     to->QL_Lines = QL_Lines;
-    return QUO_OK;  // deliberate: the multilook factors of the target stay
+    return QUO_OK;  // the same part of the image; the multilook factors of the target stay its own
 }
 int QuickLook_Obj::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, quicklook::kTable.section()); }
 int QuickLook_Obj::readhdr(const char* file) {
     readAuxiliaryFile(file, 1, quicklook::kTable.section());
-    return QUO_OK;  // deliberate: a product without a quick-look is as good as one with
+    return QUO_OK;  // a product without a quick-look is as good as one with
 }
 
-geopoint::geopoint() { createElementsVector(point::kTable.size()); }
-void geopoint::refreshParameters() { point::kTable.register_all(*this); }
+QUO_RECORD(geopoint, point::kTable)
 int geopoint::clone(geopoint* to) const {
-    to->Latitude = Latitude;
-    to->Longitude = Longitude;
-    to->Height = Height;
-    to->IncidenceAngle = IncidenceAngle;
-    to->LookAngle = LookAngle;
+    for (const auto member : point::kNamed) to->*member = this->*member;
     return point::kTable.copy(*this, *to);
 }
 int geopoint::writehdr(const char* file, const char* name) {
-    const double values[] = {Latitude, Longitude, Height, IncidenceAngle, LookAngle};
-    std::ranges::copy(values, Point);
+    std::ranges::transform(point::kNamed, Point, [this](auto member) { return this->*member; });
     return writeAuxiliaryFile(file, 1, point::section_of(name).c_str());
 }
 int geopoint::readhdr(const char* file, const char* name) {
-    // Deliberate: what Point holds becomes the named members even where neither form of the file has the point.
+    // What Point holds becomes the named members even where neither form of the file has the point: the two never
+    // differ after a read.
     if (!readAuxiliaryFile(file, 1, point::section_of(name).c_str())) {
-        if (const int unread = quo::RegistryAccess::unread(*this)) return unread;
+        if (const int unread = quo::Record::unread(*this)) return unread;
         const quo::ProfileLook look{file};
         GetProfileDoubleArray(point::kProfileSection, name, Point, static_cast<int>(std::size(Point)), file);
     }
-    Latitude = Point[0];
-    Longitude = Point[1];
-    Height = Point[2];
-    IncidenceAngle = Point[3];
-    LookAngle = Point[4];
+    const double* value = Point;
+    for (const auto member : point::kNamed) this->*member = *value++;
     return QUO_OK;
 }

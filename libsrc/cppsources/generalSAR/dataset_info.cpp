@@ -99,7 +99,7 @@ struct NumberedText {
     std::string_view text;
     int number;
 };
-// Deliberate: SS1 is 7, where the order of the others would make it 1.
+// SS1 is 7, where the order of the others would make it 1, the number of IS2.
 constexpr NumberedText kSwaths[] = {{"SS1", 7}, {"SS2", 2}, {"SS3", 3}, {"SS4", 4}, {"SS5", 5}, {"IS1", 0},
                                     {"IS2", 1}, {"IS3", 2}, {"IS4", 3}, {"IS5", 4}, {"IS6", 5}, {"IS7", 6}};
 
@@ -110,13 +110,7 @@ int number_of(std::string_view text, std::span<const NumberedText> rows) {
 
 }  // namespace
 
-DataSetInfo_Obj::DataSetInfo_Obj() { createElementsVector(kTable.size()); }
-void DataSetInfo_Obj::refreshParameters() { kTable.register_all(*this); }
-int DataSetInfo_Obj::clone(DataSetInfo_Obj* to) const { return kTable.copy(*this, *to); }
-int DataSetInfo_Obj::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, kTable.section()); }
-int DataSetInfo_Obj::readhdr(const char* file) {
-    return readAuxiliaryFile(file, 1, kTable.section()) ? QUO_OK : kTable.read_profile(*this, file);
-}
+QUO_HEADER_RECORD(DataSetInfo_Obj, kTable)
 
 int DataSetInfo_Obj::SetImageType(DSImageType value) { return store_text(ImageType, kImageTypes, value); }
 int DataSetInfo_Obj::SetSensorType(DSSensorType value) { return store_text(SensorName, kSensors, value); }

@@ -22,6 +22,29 @@ std::string side_file_of(const char* header) {
     return raster ? *raster + ".hdr" : "";
 }
 
+template <auto Object>
+int clone_object(GeneralSAR& from, GeneralSAR& to) {
+    return (from.*Object).clone(&(to.*Object));
+}
+// In the order of GSObject.
+constexpr int (*kClones[GeneralSAR::kObjects])(GeneralSAR&, GeneralSAR&) = {
+    clone_object<&GeneralSAR::dataFile>,
+    clone_object<&GeneralSAR::roi>,
+    clone_object<&GeneralSAR::polynomials>,
+    clone_object<&GeneralSAR::samplingConstants>,
+    clone_object<&GeneralSAR::stateVectors>,
+    clone_object<&GeneralSAR::orbit>,
+    clone_object<&GeneralSAR::pulse>,
+    clone_object<&GeneralSAR::antennaPattern>,
+    clone_object<&GeneralSAR::dataSetInfo>,
+    clone_object<&GeneralSAR::sensorAttitude>,
+    clone_object<&GeneralSAR::spectralWindows>,
+    clone_object<&GeneralSAR::geoCoords>,
+    clone_object<&GeneralSAR::swathInfo>,
+    // The one that copies from its argument.
+    [](GeneralSAR& from, GeneralSAR& to) { return to.bufferFile.clone(&from.bufferFile); },
+};
+
 }  // namespace
 
 GeneralSAR::GeneralSAR()
@@ -92,39 +115,7 @@ int GeneralSAR::GSdisable(GSObject object) noexcept {
 
 bool GeneralSAR::GSexists(GSObject object) const noexcept { return is_object(object) && present_[object]; }
 
-int GeneralSAR::cloneObject(int index, GeneralSAR& other) {
-    switch (static_cast<GSObject>(index)) {
-        case gsDataFile:
-            return dataFile.clone(&other.dataFile);
-        case gsRoi:
-            return roi.clone(&other.roi);
-        case gsPolySAR:
-            return polynomials.clone(&other.polynomials);
-        case gsSamplingConstants:
-            return samplingConstants.clone(&other.samplingConstants);
-        case gsStateVectors:
-            return stateVectors.clone(&other.stateVectors);
-        case gsOrbit:
-            return orbit.clone(&other.orbit);
-        case gsPulse:
-            return pulse.clone(&other.pulse);
-        case gsAntennaPattern:
-            return antennaPattern.clone(&other.antennaPattern);
-        case gsDataSetInfo:
-            return dataSetInfo.clone(&other.dataSetInfo);
-        case gsSensorAttitude:
-            return sensorAttitude.clone(&other.sensorAttitude);
-        case gsSpectralWindows:
-            return spectralWindows.clone(&other.spectralWindows);
-        case gsGeoCoords:
-            return geoCoords.clone(&other.geoCoords);
-        case gsSwathInfo:
-            return swathInfo.clone(&other.swathInfo);
-        case gsBufferFile:
-            return other.bufferFile.clone(&bufferFile);  // the one that copies from its argument
-    }
-    return QUO_REFUSED;
-}
+int GeneralSAR::cloneObject(int index, GeneralSAR& other) { return kClones[index](*this, other); }
 
 int GeneralSAR::GSclone(GeneralSAR* other) {
     quo::CallFrame frame{"GeneralSAR::GSclone", kSource};

@@ -14,6 +14,7 @@
 #include "generalSAR/orbit_table.h"
 #include "profilelib/profile_look.h"
 #include "quo_base/profile.h"
+#include "quorelxmllib/guarded.h"
 
 namespace {
 
@@ -22,7 +23,6 @@ constexpr const char* kTooFew = "You must provide at least 5 state vectors!";
 constexpr const char* kNoModel = "There are no state vectors, or no model through them";
 constexpr const char* kBadArgument = "An argument is null or not finite";
 constexpr const char* kBadTimes = "The times of the state vectors are not finite or do not increase";
-constexpr const char* kNoMemory = "Memory allocation failure";
 
 using Obj = GeneralSAROrbit;
 constexpr const auto& kTable = quo::kStateVectorTable<Obj>;
@@ -97,29 +97,21 @@ int make_resampled(const quo::StateVectors& old, double t0, std::int32_t interva
 
 }  // namespace
 
-Obj::GeneralSAROrbit() { createElementsVector(kTable.size()); }
+QUO_RECORD(GeneralSAROrbit, kTable)
 
 Obj::GeneralSAROrbit(double lambda) : GeneralSAROrbit{} { lambda_ = lambda; }
 
 Obj::~GeneralSAROrbit() { Obj::destroyBuffers(); }
 
-void Obj::refreshParameters() { kTable.register_all(*this); }
-
 int Obj::createBuffers() {
     quo::CallFrame frame{"GeneralSAROrbit::createBuffers", kSource};
     model_.reset();
     vectors_ = 0;
-    buffer_status_ = quo::create_state_vectors(*this);
-    if (buffer_status_ == QUO_OK && nSV_n >= quo::OrbitModel::kRunVectors) {
-        model_ = quo::OrbitModel::create(nSV_n);
-        if (!model_) buffer_status_ = QUO_NO_MEMORY;
-    }
-    if (buffer_status_ == QUO_OK) {
+    return quo::create_state_vectors(frame, *this, [this] {
         vectors_ = nSV_n;
-        return frame.success();
-    }
-    Obj::destroyBuffers();
-    return frame.fail(buffer_status_, quo::buffer_message(buffer_status_));
+        if (nSV_n >= quo::OrbitModel::kRunVectors) model_ = quo::OrbitModel::create(nSV_n);
+        return model_ || nSV_n < quo::OrbitModel::kRunVectors;
+    });
 }
 
 int Obj::destroyBuffers() {
@@ -137,7 +129,7 @@ int Obj::writehdr(const char* file) {
 
 int Obj::readhdr(const char* file) {
     quo::CallFrame frame{"GeneralSAROrbit::readhdr", kSource};
-    int status = quo::read_state_vectors(*this, file, buffer_status_);
+    int status = quo::read_state_vectors(*this, file);
     if (!status) status = computeApproximateSV();
     if (!status) return frame.success();
     SVDestroy();
@@ -210,10 +202,10 @@ int Obj::SVResample(double spacing, const double* times) noexcept {
     const std::int32_t intervals = intervals_for(length, spacing);
     if (intervals == 0) return frame.fail(QUO_REFUSED, "That would make more than 1000000 state vectors");
 
-    quo::StateVectors old{pSV_m, vSV_mOs, nSV_n, length / (nSV_n - 1)};
-    std::vector<double> places;
-    Resampled made;
-    try {
+    return quo::guarded(frame, [&] {
+        quo::StateVectors old{pSV_m, vSV_mOs, nSV_n, length / (nSV_n - 1)};
+        std::vector<double> places;
+        Resampled made;
         if (times) {
             places = places_of(times, nSV_n, old.spacing_s);
             if (places.empty()) return frame.fail(QUO_REFUSED, kBadTimes);
@@ -221,22 +213,21 @@ int Obj::SVResample(double spacing, const double* times) noexcept {
         } else if (const auto finding = first_uneven(old, t0)) {
             return frame.fail(QUO_REFUSED, finding->text);
         }
-    } catch (const std::bad_alloc&) {
-        return frame.fail(QUO_NO_MEMORY, kNoMemory);
-    }
-    if (const int status = make_resampled(old, t0, intervals, made))
-        return status == QUO_NO_MEMORY ? frame.fail(status, kNoMemory) : frame.callee(status);
+        if (const int status = make_resampled(old, t0, intervals, made))
+            return status == QUO_NO_MEMORY ? frame.fail(status, "Memory allocation failure")
+                                           : frame.callee(status);
 
-    const double before_m = modelReady() ? model_->resampling_error_m() : 0.0;
-    made.model->note_resampling(before_m + made.model->resampling_error_m());
-    delete[] std::exchange(pSV_m, made.positions.release());
-    delete[] std::exchange(vSV_mOs, made.velocities.release());
-    model_ = std::move(made.model);
-    t0SV_s = model_->first_time();
-    dtSV_s = model_->spacing();
-    nSV_n = vectors_ = model_->vectors();
-    refreshParameters();
-    return frame.success();
+        const double before_m = modelReady() ? model_->resampling_error_m() : 0.0;
+        made.model->note_resampling(before_m + made.model->resampling_error_m());
+        delete[] std::exchange(pSV_m, made.positions.release());
+        delete[] std::exchange(vSV_mOs, made.velocities.release());
+        model_ = std::move(made.model);
+        t0SV_s = model_->first_time();
+        dtSV_s = model_->spacing();
+        nSV_n = vectors_ = model_->vectors();
+        refreshParameters();
+        return frame.success();
+    });
 }
 
 double Obj::orbitFitError() const noexcept {
@@ -253,14 +244,12 @@ double Obj::orbitFitError() const noexcept {
 
 int Obj::SVCheck(std::vector<SVFinding>& findings) const noexcept {
     quo::CallFrame frame{"GeneralSAROrbit::SVCheck", kSource};
-    try {
+    return quo::guarded(frame, [&] {
         quo::StateVectors states = states_of(*this);
         states.count = std::min(nSV_n, vectors_);
         findings = quo::check_state_vectors(states, t0SV_s);
-    } catch (const std::bad_alloc&) {
-        return frame.fail(QUO_NO_MEMORY, kNoMemory);
-    }
-    return frame.success();
+        return frame.success();
+    });
 }
 
 int Obj::SVGetPos(double t, double* xyz) noexcept {

@@ -18,26 +18,17 @@ constexpr const auto& kTable = quo::kStateVectorTable<Obj>;
 
 }  // namespace
 
-Obj::SAROrbitStateVectors_Obj() { createElementsVector(kTable.size()); }
+QUO_RECORD(SAROrbitStateVectors_Obj, kTable)
 
 Obj::~SAROrbitStateVectors_Obj() { Obj::destroyBuffers(); }
-
-void Obj::refreshParameters() { kTable.register_all(*this); }
 
 int Obj::createBuffers() {
     quo::CallFrame frame{"SAROrbitStateVectors_Obj::createBuffers", kSource};
     drop_polynomials();
-    buffer_status_ = quo::create_state_vectors(*this);
-    if (buffer_status_ == QUO_OK && nSV_n > 0) {
-        polynomials_.reset(new (std::nothrow) double[6 * static_cast<std::size_t>(nSV_n)]());
-        if (!polynomials_) buffer_status_ = QUO_NO_MEMORY;
-    }
-    if (buffer_status_ == QUO_OK) {
+    return quo::create_state_vectors(frame, *this, [this] {
         vectors_ = nSV_n;
-        return frame.success();
-    }
-    Obj::destroyBuffers();
-    return frame.fail(buffer_status_, quo::buffer_message(buffer_status_));
+        return quo::renew_array(polynomials_, 6 * static_cast<std::size_t>(nSV_n));
+    });
 }
 
 int Obj::destroyBuffers() {
@@ -60,7 +51,7 @@ int Obj::writehdr(const char* file) {
 
 int Obj::readhdr(const char* file) {
     quo::CallFrame frame{"SAROrbitStateVectors_Obj::readhdr", kSource};
-    const int status = quo::read_state_vectors(*this, file, buffer_status_);
+    const int status = quo::read_state_vectors(*this, file);
     if (!status) return frame.success();
     SVDestroy();
     return frame.callee(status);

@@ -30,8 +30,7 @@ constexpr NamedPoint kPoints[] = {{"NorthWest", &Obj::NorthWest},
 
 }  // namespace
 
-Obj::geoCoords_Obj() { createElementsVector(kTable.size()); }
-void Obj::refreshParameters() { kTable.register_all(*this); }
+QUO_RECORD(geoCoords_Obj, kTable)
 
 int Obj::clone(geoCoords_Obj* to) const {
     for (const auto& [name, point] : kPoints) (this->*point).clone(&(to->*point));
@@ -55,7 +54,8 @@ int Obj::readhdr(const char* file) {
     return quo::guarded(frame, [&] {
         const quo::JoinedSession session{file};
         if (!readAuxiliaryFile(file, 1, kTable.section()))
-            if (const int status = kTable.read_profile(*this, file, kProfileSection)) return frame.silent(status);
+            if (const int status = kTable.of(*this).read_profile(file, kProfileSection))
+                return frame.silent(status);
         for (const auto& [name, point] : kPoints)
             if (const int status = (this->*point).readhdr(file, name)) return frame.callee(status);
         return frame.success();
@@ -87,7 +87,7 @@ int GSDataFile_Obj::writehdr(const char* file) {
     });
     // A product without its data file would be neither the old one nor the new one.
     if (status != QUO_OK) quo::HeaderSession::fail_all(status);
-    return QUO_OK;  // deliberate: the outcome stands in the report alone
+    return QUO_OK;  // a header is written without its raster, too: the outcome stands in the report alone
 }
 
 int GSDataFile_Obj::clone(GSDataFile_Obj* to) const { return to->File.clone(&File); }

@@ -16,28 +16,24 @@ inline constexpr FieldTable kStateVectorTable{
     QUO_FIELD(nSV_n, "nStateVectors"),
 };
 
-/** Allocates what the table lists. A negative count, which the table would take for none, is refused too. */
-template <typename Obj>
-int create_state_vectors(Obj& object) {
-    return object.nSV_n < 0 ? static_cast<int>(QUO_REFUSED) : kStateVectorTable<Obj>.create_buffers(object);
+/** Allocates what the table lists, and by `make_more` what the class adds to that. A negative count, which the
+ * table would take for none, is refused too; a failure leaves nothing behind. */
+template <typename Obj, typename MakeMore>
+int create_state_vectors(CallFrame& frame, Obj& object, MakeMore make_more) {
+    int status = object.nSV_n < 0 ? static_cast<int>(QUO_REFUSED) : kStateVectorTable<Obj>.create_buffers(object);
+    if (status == QUO_OK && !make_more()) status = QUO_NO_MEMORY;
+    if (status == QUO_OK) return frame.success();
+    object.Obj::destroyBuffers();
+    return frame.fail(status, status == QUO_NO_MEMORY ? "Memory allocation failure"
+                                                      : "The number of state vectors is not plausible");
 }
 
-constexpr const char* buffer_message(int status) {
-    return status == QUO_NO_MEMORY ? "Memory allocation failure" : "The number of state vectors is not plausible";
-}
-
-/** Reads the block from the XML section, else from the parameter file. `buffer_status` is where the object's
- * createBuffers() leaves its result: neither reader passes a lack of memory on.
+/** Reads the block from the XML section, else from the parameter file.
  * @return 0; 7; 4 when neither form is there and complete. */
 template <typename Obj>
-int read_state_vectors(Obj& object, const char* file, int& buffer_status) {
-    const auto& table = kStateVectorTable<Obj>;
-    buffer_status = QUO_OK;
-    if (!file) return QUO_READ_FAILED;
-    if (object.readAuxiliaryFile(file, 1, table.section())) return QUO_OK;
-    if (buffer_status == QUO_NO_MEMORY) return QUO_NO_MEMORY;
-    if (table.read_profile(object, file) == QUO_OK) return QUO_OK;
-    return buffer_status == QUO_NO_MEMORY ? QUO_NO_MEMORY : QUO_READ_FAILED;
+int read_state_vectors(Obj& object, const char* file) {
+    const int status = file ? kStateVectorTable<Obj>.read(object, file) : static_cast<int>(QUO_REFUSED);
+    return status == QUO_REFUSED ? static_cast<int>(QUO_READ_FAILED) : status;
 }
 
 }  // namespace quo

@@ -6,10 +6,7 @@
 #include <string>
 
 #include "diagnosticslib/call_frame.h"
-#include "generalSAR/counted_array.h"
-#include "profilelib/profile_look.h"
 #include "quo_base/gen_utils.h"
-#include "quo_base/profile.h"
 #include "quorelxmllib/field_table.h"
 #include "sarutillib/bounded_text.h"
 #include "sarutillib/checked_size.h"
@@ -19,7 +16,6 @@ namespace {
 
 constexpr const char* kSource = "generalSAR";
 constexpr const char* kNoMemory = "Memory allocation failure";
-constexpr const char* kChangesKey = "Swst_changes_bursts";
 
 using Obj = SwathInfo;
 constexpr quo::FieldTable kTable{
@@ -35,6 +31,7 @@ constexpr quo::FieldTable kTable{
     QUO_FIELD(ProcessorGain),
     QUO_FIELD(NoisePower),
     QUO_FIELD(ChirpPower),
+    QUO_FIELD(Swst_changes_bursts, QUO_LENGTH(Swst_changes), quo::profile_only(Obj::kMaxSwstChanges)),
 };
 
 /** Where the bursts of a raster stand. */
@@ -73,56 +70,27 @@ int read_times(DataFile& raster, const BurstLayout& layout, std::vector<double>&
 
 }  // namespace
 
-Obj::SwathInfo() { createElementsVector(kTable.size()); }
-void Obj::refreshParameters() { kTable.register_all(*this); }
+QUO_RECORD(SwathInfo, kTable)
 
 int Obj::createBuffers() {
     quo::CallFrame frame{"SwathInfo::createBuffers", kSource};
-    buffer_status_ = quo::create_counted_array(frame, Swst_changes_bursts, Swst_changes, kMaxSwstChanges,
-                                               "More changes of the sampling window than are plausible");
-    if (buffer_status_ != QUO_OK) {
-        destroyBuffers();
-        return buffer_status_;
-    }
-    refreshParameters();
-    return frame.success();
+    return kTable.of(*this).create_buffers(frame, "More changes of the sampling window than are plausible");
 }
 
 int Obj::destroyBuffers() {
-    quo::release_array(Swst_changes_bursts);
-    quo::release_array(BurstStartTimes);
-    Swst_changes = 0;
-    return QUO_OK;
+    quo::renew_array(BurstStartTimes, 0);
+    return kTable.destroy_buffers(*this);
 }
 
 int Obj::clone(SwathInfo* to) const {
     quo::CallFrame frame{"SwathInfo::clone", kSource};
     if (to == this) return frame.success();
-    try {
-        to->Swst_changes_bursts = Swst_changes_bursts;
-        to->BurstStartTimes = BurstStartTimes;
-    } catch (const std::bad_alloc&) {
-        return frame.fail(QUO_NO_MEMORY, kNoMemory);
-    }
-    if (const int status = kTable.copy(*this, *to)) return frame.callee(status);
-    return frame.success();
+    const bool copied = kTable.copy(*this, *to) == QUO_OK && quo::copy_array(to->BurstStartTimes, BurstStartTimes);
+    return copied ? frame.success() : frame.fail(QUO_NO_MEMORY, kNoMemory);
 }
 
 int Obj::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, kTable.section()); }
-
-int Obj::readhdr(const char* file) {
-    buffer_status_ = QUO_OK;
-    if (readAuxiliaryFile(file, 1, kTable.section())) return QUO_OK;
-    if (buffer_status_ == QUO_NO_MEMORY) return QUO_NO_MEMORY;
-    const quo::ProfileLook look{file};
-    const int scalars = kTable.read_profile(*this, file);
-    if (const int status = createBuffers()) return status;
-    if (Swst_changes < 1 || GetMyProfileIntArray(kTable.section(), kChangesKey, Swst_changes_bursts.data(),
-                                                 Swst_changes, file) == QUO_OK)
-        return scalars;
-    freeall_ckerr();
-    return QUO_REFUSED;
-}
+int Obj::readhdr(const char* file) { return kTable.read(*this, file); }
 
 int Obj::readBurstTimes(const char* raster) {
     quo::CallFrame frame{"SwathInfo::readBurstTimes", kSource};
@@ -138,7 +106,7 @@ int Obj::readBurstTimes(const char* raster) {
     if (quo::file_length(raster).value_or(-1) < layout->bytes)
         return frame.fail(QUO_READ_FAILED, "The raster is shorter than its bursts");
     std::vector<double> times;
-    if (!quo::allocate_array(times, static_cast<std::size_t>(Bursts))) return frame.fail(QUO_NO_MEMORY, kNoMemory);
+    if (!quo::renew_array(times, static_cast<std::size_t>(Bursts))) return frame.fail(QUO_NO_MEMORY, kNoMemory);
     if (const int status = read_times(file, *layout, times)) return frame.callee(status);
     BurstStartTimes.swap(times);
     return frame.success();

@@ -5,7 +5,6 @@
 
 #include "diagnosticslib/call_frame.h"
 #include "generalSAR/annex_file.h"
-#include "generalSAR/counted_array.h"
 #include "generalSAR/raster_name.h"
 #include "quo_base/gen_utils.h"
 #include "quo_base/swath.h"
@@ -24,6 +23,7 @@ constexpr quo::FieldTable kTable{
     QUO_FIELD(StartAngle),
     QUO_FIELD(DeltaAngle),
     QUO_FIELD(PatternSamples, quo::bounds(0, 10000), quo::kOptional),
+    QUO_FIELD(Pattern, QUO_LENGTH(PatternSamples), quo::in_memory_only(Obj::kMaxPatternSamples)),
 };
 
 constexpr std::size_t kFloat = 4, kAnnexRecord = (2 + Obj::kAnnexSamples) * kFloat;
@@ -42,31 +42,15 @@ void Obj::refreshParameters() { kTable.register_all(*this); }
 
 int Obj::createBuffers() {
     quo::CallFrame frame{"AntennaPattern_Obj::createBuffers", kSource};
-    buffer_status_ = quo::create_counted_array(frame, Pattern, PatternSamples, kMaxPatternSamples,
-                                               "More pattern samples than are plausible");
-    if (buffer_status_ != QUO_OK) {
-        destroyBuffers();
-        return buffer_status_;
-    }
-    refreshParameters();
-    return frame.success();
+    return kTable.of(*this).create_buffers(frame, "More pattern samples than are plausible");
 }
 
-int Obj::destroyBuffers() {
-    quo::release_array(Pattern);
-    PatternSamples = 0;
-    return QUO_OK;
-}
+int Obj::destroyBuffers() { return kTable.destroy_buffers(*this); }
 
 int Obj::clone(AntennaPattern_Obj* to) const {
     quo::CallFrame frame{"AntennaPattern_Obj::clone", kSource};
     if (to == this) return frame.success();
-    try {
-        to->Pattern = Pattern;
-    } catch (const std::bad_alloc&) {
-        return frame.fail(QUO_NO_MEMORY, kNoMemory);
-    }
-    if (const int status = kTable.copy(*this, *to)) return frame.callee(status);
+    if (const int status = kTable.copy(*this, *to)) return frame.fail(status, kNoMemory);
     if (const int status = to->PatternFile.clone(&PatternFile)) return frame.callee(status);
     return frame.success();
 }
@@ -85,11 +69,8 @@ int Obj::writehdr() {
 
 int Obj::readhdr(const char* file) {
     quo::CallFrame frame{"AntennaPattern_Obj::readhdr", kSource};
-    buffer_status_ = QUO_OK;
-    if (!readAuxiliaryFile(file, 1, kTable.section())) {
-        if (buffer_status_ == QUO_NO_MEMORY) return frame.callee(buffer_status_);
-        if (const int status = kTable.read_profile(*this, file)) return frame.silent(status);
-    }
+    if (const int status = kTable.read(*this, file))
+        return status == QUO_NO_MEMORY ? frame.callee(status) : frame.silent(status);
     const auto raster = quo::raster_of_header(quo::text_or_empty(file));
     if (!raster) return frame.fail(QUO_REFUSED, "The header's name is no more than its ending");
     if (const int status = PatternFile.read_hdr(raster->c_str())) return frame.callee(status);
@@ -117,7 +98,7 @@ int Obj::getPatternArray(float* pattern) {
     BufferIO line{&file, 0, PatternSamples, 0, 1, FLOAT32};
     if (const int status = line.readbuffer(reinterpret_cast<char*>(loaded.data()), PatternSamples))
         return frame.callee(status);
-    if (Pattern.size() != n && !quo::allocate_array(Pattern, n)) return frame.fail(QUO_NO_MEMORY, kNoMemory);
+    if (Pattern.size() != n && !quo::renew_array(Pattern, n)) return frame.fail(QUO_NO_MEMORY, kNoMemory);
     std::ranges::copy(loaded, Pattern.begin());
     std::ranges::copy(loaded, pattern);
     return frame.success();
@@ -146,8 +127,7 @@ int Obj::getPatternENVI(const char* annex_file, int swath, int polarization) {
         return frame.fail(QUO_REFUSED, "The annex file has no such swath or polarization");
     quo::TrackedBuffer<char> data{kAnnexData};
     std::vector<float> gains;
-    if (!data || !quo::allocate_array(gains, std::size_t{kAnnexSamples}))
-        return frame.fail(QUO_NO_MEMORY, kNoMemory);
+    if (!data || !quo::renew_array(gains, std::size_t{kAnnexSamples})) return frame.fail(QUO_NO_MEMORY, kNoMemory);
     if (const int status = quo::read_annex_data(annex_file, data.data(), data.size())) return frame.callee(status);
 
     const char* record =

@@ -1,15 +1,13 @@
 #include "quo_base/generalSAR_configuration.h"
 
-#include <array>
 #include <limits>
-#include <new>
 #include <typeinfo>
 
 #include "diagnosticslib/call_frame.h"
 #include "generalSAR/readable_file.h"
 #include "quorelxmllib/field_table.h"
+#include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_session.h"
-#include "sarutillib/bounded_text.h"
 
 namespace {
 
@@ -29,13 +27,25 @@ namespace shared {
 using Obj = GeneralSAR_BaseConfiguration;
 constexpr quo::FieldTable kTable{
     kSharedSection,
-    QUO_FIELD(Memory, kCount, note("MB", "working memory that a processor may take")),
-    QUO_FIELD(Incore, kFlag, note("", "keep intermediate results in memory")),
-    QUO_FIELD(Verbose, kCount, note("", "above 0 prints progress in detail")),
-    QUO_FIELD(ReportLevel, quo::bounds(0, 3), note("", "level of the report; 0 none")),
-    QUO_FIELD(ReportFilename, note("", "name of the report file")),
+    QUO_FIELD(Memory, kCount, quo::kOptional, note("MB", "working memory that a processor may take")),
+    QUO_FIELD(Incore, kFlag, quo::kOptional, note("", "keep intermediate results in memory")),
+    QUO_FIELD(Verbose, kCount, quo::kOptional, note("", "above 0 prints progress in detail")),
+    QUO_FIELD(ReportLevel, quo::bounds(0, 3), quo::kOptional, note("", "level of the report; 0 none")),
+    QUO_FIELD(ReportFilename, quo::kOptional, note("", "name of the report file")),
 };
 static_assert(kTable.size() == Obj::kSharedParameters);
+
+/** The shared parameters of one record as a section of a header file. */
+class Section final : public GeneralSAR_Base {
+public:
+    explicit Section(Obj& owner) : owner_{owner} { createElementsVector(kTable.size()); }
+
+protected:
+    void refreshParameters() override { kTable.of(*this, owner_).register_all(); }
+
+private:
+    Obj& owner_;
+};
 }  // namespace shared
 
 namespace azimuth {
@@ -237,11 +247,8 @@ GeneralSAR_BaseConfiguration::~GeneralSAR_BaseConfiguration() = default;
 
 parElement GeneralSAR_BaseConfiguration::sharedParameter(int index) {
     parElement element;
-    if (const auto* row = shared::kTable.row(index)) {
-        const quo::FieldValue field = row->at(*this);
-        element.setElement(field.name, field.pointer, field.type, field.count, field.minimum, field.maximum,
-                           false);
-    }
+    element.section = kSharedSection;
+    if (const auto* row = shared::kTable.row(index)) row->describe(this, element);
     return element;
 }
 const char* GeneralSAR_BaseConfiguration::sharedUnit(int index) {
@@ -255,29 +262,13 @@ const char* GeneralSAR_BaseConfiguration::sharedMeaning(int index) {
 
 int GeneralSAR_BaseConfiguration::clone(GeneralSAR_BaseConfiguration* to) const {
     if (!to) return QUO_REFUSED;
-    to->Memory = Memory;
-    to->Incore = Incore;
-    to->Verbose = Verbose;
-    to->ReportLevel = ReportLevel;
-    quo::copy_bounded(to->ReportFilename, ReportFilename);
+    auto& from = const_cast<GeneralSAR_BaseConfiguration&>(*this);  // only read
+    for (int i = 0; i < kSharedParameters; ++i) quo::copy_values(from.sharedParameter(i), to->sharedParameter(i));
     return QUO_OK;
 }
 
 int GeneralSAR_BaseConfiguration::readConf(const char* file, int channel, const char* section) {
-    quorelxml document{file};
-    for (int i = 0; i < kSharedParameters; ++i) {
-        const parElement parameter = sharedParameter(i);
-        char path[1024];  // a longer path is cut, and leads nowhere
-        const std::string_view folder = quo::text_or_empty(section);
-        quo::format_bounded(path, sizeof path, "%.*s/%s", static_cast<int>(folder.size()), folder.data(),
-                            parameter.name);
-        if (parameter.type == parElement::typeString) {
-            char* text = static_cast<char*>(parameter.pointer);
-            document.readString(channel, path, &text, 1, parameter.room);
-        } else {
-            document.readInt(channel, path, static_cast<std::int32_t*>(parameter.pointer), 1);
-        }
-    }
+    shared::Section{*this}.readAuxiliaryFile(file, channel, section);
     return QUO_OK;
 }
 
@@ -318,78 +309,46 @@ int GeneralSAR_ConfigurationRecord::clone(GeneralSAR_BaseConfiguration* to) cons
     auto* record = dynamic_cast<GeneralSAR_ConfigurationRecord*>(to);
     if (!record || typeid(*record) != typeid(*this)) return QUO_REFUSED;
     GeneralSAR_BaseConfiguration::clone(to);
-    for (int i = 0; i < elementCount(); ++i) {
-        const parElement& from = *element(i);
-        quo::copy_values(from.type, from.count, from.room, from.pointer, record->element(i)->pointer);
-    }
+    for (int i = 0; i < elementCount(); ++i) quo::copy_values(*element(i), *record->element(i));
     return QUO_OK;
 }
-
-// What is the same for every record but for its table.
-#define QUO_RECORD(Class, part)                                               \
-    Class::Class() : GeneralSAR_ConfigurationRecord{part::kTable.section()} { \
-        createElementsVector(part::kTable.size());                            \
-    }                                                                         \
-    void Class::refreshParameters() { part::kTable.register_all(*this); }     \
-    const char* Class::unit(int index) const {                                \
-        const auto* field = part::kTable.row(index);                          \
-        return field ? field->unit : "";                                      \
-    }                                                                         \
-    const char* Class::meaning(int index) const {                             \
-        const auto* field = part::kTable.row(index);                          \
-        return field ? field->meaning : "";                                   \
-    }
-QUO_RECORD(AzimuthConf, azimuth)
-QUO_RECORD(DCestConf, doppler)
-QUO_RECORD(ExtractorConf, extractor)
-QUO_RECORD(generalProcessingConf, processing)
-QUO_RECORD(FinefitestConf, fine)
-QUO_RECORD(EnvisatCalibrationFactors, calibration)
-QUO_RECORD(DemExtractorConf, dem)
-QUO_RECORD(GeocodingConf, geocoding)
-QUO_RECORD(ATPrecise_FitestConf, precise)
-QUO_RECORD(CoregistrationConf, resampling)
-QUO_RECORD(CoherenceConf, coherence)
-#undef QUO_RECORD
 
 namespace {
 
 using Record = GeneralSAR_ConfigurationRecord;
-struct Kind {
-    const char* name;
-    std::unique_ptr<Record> (*make)();
-};
-template <typename Class>
-constexpr Kind kind(const char* name) {
-    return {name, []() -> std::unique_ptr<Record> { return std::make_unique<Class>(); }};
+
+parElement element_of(const Record& record, int index) {
+    const parElement* element = record.element(index);
+    return element ? *element : parElement{};
 }
-constexpr std::array kKinds{
-    kind<AzimuthConf>(azimuth::kTable.section()),
-    kind<DCestConf>(doppler::kTable.section()),
-    kind<ExtractorConf>(extractor::kTable.section()),
-    kind<generalProcessingConf>(processing::kTable.section()),
-    kind<FinefitestConf>(fine::kTable.section()),
-    kind<EnvisatCalibrationFactors>(calibration::kTable.section()),
-    kind<DemExtractorConf>(dem::kTable.section()),
-    kind<GeocodingConf>(geocoding::kTable.section()),
-    kind<ATPrecise_FitestConf>(precise::kTable.section()),
-    kind<CoregistrationConf>(resampling::kTable.section()),
-    kind<CoherenceConf>(coherence::kTable.section()),
-};
-constexpr auto kNames = [] {
-    std::array<const char*, kKinds.size()> names{};
-    for (std::size_t i = 0; i < names.size(); ++i) names[i] = kKinds[i].name;
-    return names;
-}();
 
 }  // namespace
 
-std::span<const char* const> Record::names() { return kNames; }
+// The records, each with the namespace of its table.
+#define QUO_EACH_RECORD(see)                                                                                     \
+    see(AzimuthConf, azimuth) see(DCestConf, doppler) see(ExtractorConf, extractor)                              \
+        see(generalProcessingConf, processing) see(FinefitestConf, fine)                                         \
+            see(EnvisatCalibrationFactors, calibration) see(DemExtractorConf, dem) see(GeocodingConf, geocoding) \
+                see(ATPrecise_FitestConf, precise) see(CoregistrationConf, resampling)                           \
+                    see(CoherenceConf, coherence)
+
+#define QUO_DEFINE(Class, part)                                                                    \
+    Class::Class() : Record{part::kTable.section()} { createElementsVector(part::kTable.size()); } \
+    void Class::refreshParameters() { part::kTable.register_all(*this); }                          \
+    const char* Class::unit(int index) const { return element_of(*this, index).unit; }             \
+    const char* Class::meaning(int index) const { return element_of(*this, index).meaning; }
+QUO_EACH_RECORD(QUO_DEFINE)
+
+std::span<const char* const> Record::names() {
+#define QUO_NAME(Class, part) part::kTable.section(),
+    static constexpr const char* kNames[] = {QUO_EACH_RECORD(QUO_NAME)};
+    return kNames;
+}
 
 std::unique_ptr<Record> Record::make(std::string_view name) {
-    for (const Kind& kind : kKinds) {
-        if (name == kind.name) return kind.make();
-    }
+#define QUO_MAKE(Class, part) \
+    if (name == part::kTable.section()) return std::make_unique<Class>();
+    QUO_EACH_RECORD(QUO_MAKE)
     return nullptr;
 }
 
@@ -418,31 +377,29 @@ bool GeneralSAR_configuration::GSexists(GScObject object) const {
 }
 
 int GeneralSAR_configuration::GSwrite(const char* file, int channel) {
-    try {
+    quo::CallFrame frame{"GeneralSAR_configuration::GSwrite", kSource};
+    const int status = quo::guarded(frame, [&] {
         quo::JoinedSession session{file};
-        for (int i = 0; i < kSelectors; ++i) {
+        for (int i = 0; i < kSelectors; ++i)
             if (enabled_[i]) table_[i]->writepar(file, channel);
-        }
-        if (session.commit() != QUO_OK) fail("GSwrite", "Cannot write specific configuration file");
-    } catch (const std::bad_alloc&) {
-        fail("GSwrite", "Cannot write specific configuration file");
-    }
+        const int saved = session.commit();
+        return saved ? frame.silent(saved) : frame.success();
+    });
+    if (status != QUO_OK) fail("GSwrite", "Cannot write specific configuration file");
     return QUO_OK;
 }
 
 int GeneralSAR_configuration::GSread(const char* file, int channel) {
     quo::CallFrame frame{"GeneralSAR_configuration::GSread", kSource};
     if (const int status = quo::refuse_missing_file(frame, file)) return status;
-    try {
+    return quo::guarded(frame, [&] {
         const quo::JoinedSession session{file};
         for (int i = 0; i < kSelectors; ++i) {
             enabled_[i] = true;
             enabled_[i] = table_[i]->readpar(file, channel) == QUO_OK;
         }
-    } catch (const std::bad_alloc&) {
-        return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
-    }
-    return frame.success();
+        return frame.success();
+    });
 }
 
 int GeneralSAR_configuration::GSclone(GeneralSAR_configuration* to) const {

@@ -13,13 +13,6 @@ namespace {
 
 constexpr std::size_t kLongestQuote = 40;
 
-std::string_view trimmed(std::string_view text) {
-    constexpr std::string_view kBlanks = " \t\r\n";
-    const auto first = text.find_first_not_of(kBlanks);
-    if (first == std::string_view::npos) return {};
-    return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
-}
-
 std::string quoted(std::string_view text) {
     const bool cut = text.size() > kLongestQuote;
     return '"' + std::string{text.substr(0, kLongestQuote)} + (cut ? "...\"" : "\"");
@@ -78,7 +71,7 @@ std::string text_defect(const parElement& element, std::string_view text) {
         case parRule::anyText:
             break;
         case parRule::filledText:
-            if (trimmed(text).empty()) return "is empty";
+            if (quo::trimmed(text).empty()) return "is empty";
             break;
         case parRule::listedText:
             if (std::ranges::find(element.rule.texts, text) == element.rule.texts.end())
@@ -94,7 +87,7 @@ std::string text_defect(const parElement& element, std::string_view text) {
 }  // namespace
 
 std::string parElement::defect(std::string_view text) const {
-    return type == typeString ? text_defect(*this, text) : number_defect(*this, trimmed(text));
+    return type == typeString ? text_defect(*this, text) : number_defect(*this, quo::trimmed(text));
 }
 
 std::string parElement::countDefect(std::size_t values) const {

@@ -1,7 +1,6 @@
 #ifndef QUO_FIELD_TABLE_H
 #define QUO_FIELD_TABLE_H
 
-#include <algorithm>
 #include <array>
 #include <concepts>
 #include <cstddef>
@@ -16,225 +15,212 @@
 #include <utility>
 #include <vector>
 
-#include "profilelib/profile_look.h"
-#include "quo_base/ckerr.h"
+#include "diagnosticslib/call_frame.h"
 #include "quo_base/quorelxml_v2.h"
-#include "sarutillib/checked_size.h"
 
 namespace quo {
 
 /** How a field takes part in the parameter-file fallback. */
 enum class InProfile : std::uint8_t { kMandatory, kOptional, kAbsent };
 
-/** One field of one object at one moment, whatever its class: what registering, copying and the parameter-file
- * fallback need. */
-struct FieldValue {
-    const char* name;  // element name
-    const char* key;   // parameter-file key
-    parElement::ParameterType type;
-    void* pointer;       // null while an array is not allocated
-    std::int32_t count;  // 0 while an array is not allocated
-    double minimum, maximum;
-    bool mandatory;
-    InProfile in_profile;
-    std::size_t room;  // bytes of a text
-    parRule rule;
+/** What is done with an array member, whatever holds its values: a pointer, a unique_ptr or a vector. */
+struct ArrayKind {
+    /** The first value; null while there is none. */
+    void* (*values)(void* member);
+    /** Puts zeros in the place of what the array held, nothing for a count of 0. False, with an empty array, when
+     * memory is short. */
+    bool (*renew)(void* member, std::size_t count);
+    /** Copies an array that knows its own length, as renew() does; null for the others. */
+    bool (*assign)(void* member, const void* from);
 };
 
-/** Way to the registry's protected operations for the field tables and the header sessions. */
-struct RegistryAccess {
-    static void add(GeneralSAR_BaseXML& object, const FieldValue& field);
-    static void set_allocated(GeneralSAR_BaseXML& object, bool allocated);
-    static void refresh(GeneralSAR_BaseXML& object);
-    /** Whether an array of `count` values may be allocated for what the object is being read from. */
-    static bool can_hold(const GeneralSAR_BaseXML& object, std::int64_t count);
-    /** 4 or 7 when the object's last read of a header file failed because the file could not be read or for want
-     * of memory, else 0: then its section is not missing, and no other form of the file may take its place. */
-    static int unread(const GeneralSAR_BaseXML& object);
-    /** Names the parameter file that is being read as the source of lengths; null ends it. */
-    static void set_source(GeneralSAR_BaseXML& object, const char* file);
-};
-
-/** Reads the fields from one section of a parameter file, every key even after a failure. False when a mandatory
- * key failed. */
-bool read_profile_fields(std::span<const FieldValue> fields, const char* section, const char* file);
-
-/** Copies values of one type; `room` is that of a text. */
-void copy_values(parElement::ParameterType type, std::int32_t count, std::size_t room, const void* from, void* to);
-/** The registered element of this name if it holds values now, else null. */
-const parElement* registered_array(const GeneralSAR_BaseXML& object, const char* name);
-
-/** One row of a field table. */
-template <typename Owner>
+/** One row: all that is known of a field. The owner is an object of the class that the row was made for. */
 struct Field {
-    const char* name = nullptr;
-    const char* key = nullptr;
+    const char *name = "", *key = "";  // of the element, and in parameter files
     parElement::ParameterType type = parElement::typeNone;
+    std::int32_t count = 0;  // values; of an array of any length 0
+    std::size_t room = parElement::kTextRoom;
     double minimum = 0.0, maximum = 0.0;
     bool mandatory = true;
     InProfile in_profile = InProfile::kMandatory;
-    std::size_t room = 0;
     parRule rule;
     const char *unit = "", *meaning = "";
 
-    void* (*address)(Owner&) = nullptr;  // first value; null while an array is not allocated
-    std::int32_t fixed_count = 0;        // 0: the length is a member
-    std::int32_t (*length)(const Owner&) = nullptr;
-    void (*set_length)(Owner&, std::int32_t) = nullptr;
+    void* (*member)(void* owner) = nullptr;
+    const ArrayKind* array = nullptr;  // of an array of any length
+    std::int32_t* (*length)(void* owner) = nullptr;
     std::int32_t per_length = 0;  // values per unit of length; 0: no length is known
-    bool (*allocate)(Owner&, std::size_t) = nullptr;
-    void (*release)(Owner&) = nullptr;
+    std::int32_t most = 0;        // values that are believed, of an array that XML does not have; 0: XML has it
 
-    [[nodiscard]] constexpr bool is_array_of_any_length() const { return fixed_count == 0; }
-    /** Values that the object's length member asks for; nothing when that is more than an int can count. */
-    [[nodiscard]] std::optional<std::int32_t> wanted_count(const Owner& object) const {
-        if (!is_array_of_any_length()) return fixed_count;
-        return (Checked<std::int32_t>{std::max(length(object), 0)} * per_length).value();
-    }
-    [[nodiscard]] FieldValue at(Owner& object) const {
-        void* pointer = address(object);
-        const std::int32_t count = pointer ? wanted_count(object).value_or(0) : 0;
-        return {name, key, type, pointer, count, minimum, maximum, mandatory, in_profile, room, rule};
-    }
+    /** Values that the length member asks for; nothing when that is more than an int can count. */
+    [[nodiscard]] std::optional<std::int32_t> wanted_count(void* owner) const;
+    /** The field of one object as it is now. */
+    void describe(void* owner, parElement& element) const;
 };
+
+/** An object together with its table: what every record does with its fields is written here once. */
+class Record {
+public:
+    Record(const char* section, std::span<const Field> fields, GeneralSAR_BaseXML& object, void* owner)
+        : section_{section}, fields_{fields}, object_{object}, owner_{owner} {}
+
+    /** The whole of refreshParameters(): registers every field and sets the allocation flag. */
+    void register_all() const;
+    /** createBuffers() for the arrays of the table: a length above 0 that the source cannot hold is refused (1), a
+     * failed allocation gives 7; neither leaves an array behind. */
+    [[nodiscard]] int create_buffers() const;
+    /** The same with an entry for a failure, `implausible` for a refused length. */
+    [[nodiscard]] int create_buffers(CallFrame& frame, const char* implausible) const;
+    /** destroyBuffers() for the arrays of the table: released, their lengths 0, and the allocation flag cleared
+     * where an element lost its values. */
+    int destroy_buffers() const;
+    /** Copies every field of another object of the class, the arrays made anew. 0; 7; or the status of
+     * createBuffers(). */
+    [[nodiscard]] int copy(const Record& from) const;
+    /** Reads the XML section, else the parameter file. 0; 7 when the buffers found no memory; 1. */
+    [[nodiscard]] int read(const char* file) const;
+    /** Reads the fields from the parameter file: single values and arrays of fixed size, then createBuffers(),
+     * then the arrays that it made. Every key is read, even after a failure. The file does not stay among the
+     * parameter files in memory. `keys` take the place of the table's, one for each field.
+     * @return 0; 1, with the pending errors cleared, when a mandatory key failed, and with nothing read when the
+     * other form of the file was not found missing but could not be read. */
+    int read_profile(const char* file, const char* section, std::span<const char* const> keys = {}) const;
+
+    /** 4 or 7 when the object's last read of a header file failed because the file could not be read or for want
+     * of memory, else 0: then its section is not missing, and no other form of the file may take its place. */
+    static int unread(const GeneralSAR_BaseXML& object) { return object.unread_; }
+
+private:
+    [[nodiscard]] bool has_arrays() const;
+    [[nodiscard]] const parElement* allocated(std::size_t row) const;
+    void copy_values(const Record& from, std::size_t row) const;
+    bool read_keys(const char* file, const char* section, std::span<const char* const> keys, bool arrays) const;
+    bool read_whole_profile(const char* file, const char* section, std::span<const char* const> keys) const;
+
+    const char* section_;
+    std::span<const Field> fields_;
+    GeneralSAR_BaseXML& object_;
+    void* owner_;
+};
+
+/** Copies the values of an element to another one of the same type, count and room. */
+void copy_values(const parElement& from, const parElement& to);
 
 // --- the rules of a row ---------------------------------------------------------------------------------------
 
-struct Bounds {
-    double minimum, maximum;
-};
 /** The values that make sense; not enforced on reading. */
-constexpr Bounds bounds(double minimum, double maximum) { return {minimum, maximum}; }
+constexpr auto bounds(double minimum, double maximum) {
+    return [=](Field& field) {
+        field.minimum = minimum;
+        field.maximum = maximum;
+    };
+}
 
+constexpr auto checked_by(parRule rule) {
+    return [=](Field& field) { field.rule = rule; };
+}
 /** Which numbers make sense where a field is registered without bounds, or with other ones that older readers
  * rely on. */
-constexpr parRule between(double lowest, double highest) {
-    return {.bounded = true, .lowest = lowest, .highest = highest};
+constexpr auto between(double lowest, double highest) {
+    return checked_by({.bounded = true, .lowest = lowest, .highest = highest});
 }
-constexpr parRule at_least(double lowest) { return between(lowest, std::numeric_limits<double>::infinity()); }
-constexpr parRule above(double limit) {
-    parRule rule = at_least(limit);
-    rule.above_lowest = true;
-    return rule;
+constexpr auto at_least(double lowest) { return between(lowest, std::numeric_limits<double>::infinity()); }
+constexpr auto above(double limit) {
+    return checked_by({.bounded = true,
+                       .above_lowest = true,
+                       .lowest = limit,
+                       .highest = std::numeric_limits<double>::infinity()});
 }
 /** The only texts of a field, in an array that stays. */
-constexpr parRule one_of(std::span<const std::string_view> texts) {
-    return {.text = parRule::listedText, .texts = texts};
+constexpr auto one_of(std::span<const std::string_view> texts) {
+    return checked_by({.text = parRule::listedText, .texts = texts});
 }
 /** A text that says something, and one that is a date. */
-inline constexpr parRule kFilled{.text = parRule::filledText};
-inline constexpr parRule kDate{.text = parRule::dateText};
+inline constexpr auto kFilled = checked_by({.text = parRule::filledText});
+inline constexpr auto kDate = checked_by({.text = parRule::dateText});
 
-struct Note {
-    const char *unit, *meaning;
-};
 /** What the value is, for generated documentation. */
-constexpr Note note(const char* unit, const char* meaning) { return {unit, meaning}; }
-
-struct Element {
-    const char* name;
-};
+constexpr auto note(const char* unit, const char* meaning) {
+    return [=](Field& field) {
+        field.unit = unit;
+        field.meaning = meaning;
+    };
+}
 /** The element name, where it is not the member's own. */
-constexpr Element element(const char* name) { return {name}; }
+constexpr auto element(const char* name) {
+    return [=](Field& field) { field.name = name; };
+}
+
+/** The field may be missing in a parameter file. */
+inline constexpr auto kProfileOptional = [](Field& field) { field.in_profile = InProfile::kOptional; };
+/** The field may be missing, in the XML section and in a parameter file. */
+inline constexpr auto kOptional = [](Field& field) {
+    field.mandatory = false;
+    field.in_profile = InProfile::kOptional;
+};
+/** Parameter files do not have the field. */
+inline constexpr auto kXmlOnly = [](Field& field) { field.in_profile = InProfile::kAbsent; };
+/** The XML section does not have the array, which a file cannot make longer than `most`; last rows only. */
+constexpr auto profile_only(std::int32_t most) {
+    return [=](Field& field) { field.most = most; };
+}
+/** Nor does a parameter file. */
+constexpr auto in_memory_only(std::int32_t most) {
+    return [=](Field& field) {
+        field.most = most;
+        field.in_profile = InProfile::kAbsent;
+    };
+}
 
 /** The length of an array of any length; see QUO_LENGTH. */
-template <typename Owner>
-struct Length {
-    std::int32_t (*get)(const Owner&);
-    void (*set)(Owner&, std::int32_t);
-    std::int32_t per_length;
-};
 template <typename Owner, auto Member>
-constexpr Length<Owner> length(std::int32_t per_length = 1) {
-    return {[](const Owner& object) -> std::int32_t { return object.*Member; },
-            [](Owner& object, std::int32_t value) { object.*Member = value; }, per_length};
-}
-
-enum class Presence : std::uint8_t { kOptional, kProfileOptional, kXmlOnly };
-/** The field may be missing, in the XML section and in a parameter file. */
-inline constexpr Presence kOptional = Presence::kOptional;
-/** The field may be missing in a parameter file. */
-inline constexpr Presence kProfileOptional = Presence::kProfileOptional;
-/** Parameter files do not have the field. */
-inline constexpr Presence kXmlOnly = Presence::kXmlOnly;
-
-template <typename Owner>
-constexpr void apply(Field<Owner>& field, const char* key) {
-    field.key = key;
-}
-template <typename Owner>
-constexpr void apply(Field<Owner>& field, Bounds rule) {
-    field.minimum = rule.minimum;
-    field.maximum = rule.maximum;
-}
-template <typename Owner>
-constexpr void apply(Field<Owner>& field, parRule rule) {
-    field.rule = rule;
-}
-template <typename Owner>
-constexpr void apply(Field<Owner>& field, Note rule) {
-    field.unit = rule.unit;
-    field.meaning = rule.meaning;
-}
-template <typename Owner>
-constexpr void apply(Field<Owner>& field, Element rule) {
-    field.name = rule.name;
-}
-template <typename Owner>
-constexpr void apply(Field<Owner>& field, Length<Owner> rule) {
-    field.length = rule.get;
-    field.set_length = rule.set;
-    field.per_length = rule.per_length;
-}
-template <typename Owner>
-constexpr void apply(Field<Owner>& field, Presence rule) {
-    if (rule == Presence::kOptional) field.mandatory = false;
-    if (rule == Presence::kXmlOnly)
-        field.in_profile = InProfile::kAbsent;
-    else if (field.in_profile != InProfile::kAbsent)
-        field.in_profile = InProfile::kOptional;
+constexpr auto length(std::int32_t per_length = 1) {
+    return [=](Field& field) {
+        field.length = [](void* owner) -> std::int32_t* { return &(static_cast<Owner*>(owner)->*Member); };
+        field.per_length = per_length;
+    };
 }
 
 // --- what follows from a member's type --------------------------------------------------------------------------
 
 template <typename T>
-constexpr parElement::ParameterType number_type() {
+constexpr parElement::ParameterType type_of() {
+    if constexpr (std::same_as<T, char>) return parElement::typeString;
     if constexpr (std::same_as<T, double>) return parElement::typeDouble;
     if constexpr (std::same_as<T, float>) return parElement::typeFloat;
-    static_assert(std::same_as<T, double> || std::same_as<T, float> || std::same_as<T, std::int32_t>,
+    static_assert(std::same_as<T, char> || std::floating_point<T> || std::same_as<T, std::int32_t>,
                   "a field holds doubles, floats, 32-bit ints or text");
     return parElement::typeInt;
 }
 
-template <typename T>
-T* data_of(T* array) {
-    return array;
-}
-template <typename T>
-T* data_of(std::unique_ptr<T[]>& array) {
-    return array.get();
-}
-template <typename T>
-T* data_of(std::vector<T>& array) {
-    return array.empty() ? nullptr : array.data();
-}
-
 // Arrays of an object outlive the call that makes them, so they never come from the tracked allocator.
 template <typename T>
-bool allocate_array(std::unique_ptr<T[]>& array, std::size_t count) {
-    array.reset(new (std::nothrow) T[count]());
-    return array != nullptr;
+bool renew_array(T*& array, std::size_t count) {
+    delete[] std::exchange(array, nullptr);
+    if (count > 0) array = new (std::nothrow) T[count]();
+    return array || count == 0;
 }
 template <typename T>
-bool allocate_array(T*& array, std::size_t count) {
-    delete[] array;
-    array = new (std::nothrow) T[count]();
-    return array != nullptr;
+bool renew_array(std::unique_ptr<T[]>& array, std::size_t count) {
+    T* values = array.release();
+    const bool made = renew_array(values, count);
+    array.reset(values);
+    return made;
 }
 template <typename T>
-bool allocate_array(std::vector<T>& array, std::size_t count) {
+bool copy_array(std::vector<T>& array, const std::vector<T>& from) {
     try {
-        array.assign(count, T{});
+        array = from;
+        return true;
+    } catch (const std::bad_alloc&) {
+        return false;
+    }
+}
+template <typename T>
+bool renew_array(std::vector<T>& array, std::size_t count) {
+    array = {};
+    try {
+        array.resize(count);
         return true;
     } catch (const std::bad_alloc&) {
         return false;
@@ -242,48 +228,58 @@ bool allocate_array(std::vector<T>& array, std::size_t count) {
 }
 
 template <typename T>
-void release_array(std::unique_ptr<T[]>& array) {
-    array.reset();
+T* values_of(T*& array) {
+    return array;
 }
 template <typename T>
-void release_array(T*& array) {
-    delete[] array;
-    array = nullptr;
+T* values_of(std::unique_ptr<T[]>& array) {
+    return array.get();
 }
 template <typename T>
-void release_array(std::vector<T>& array) {
-    array = {};
+T* values_of(std::vector<T>& array) {
+    return array.empty() ? nullptr : array.data();
 }
+
+template <typename Member>
+inline constexpr ArrayKind kArrayKind{
+    [](void* member) -> void* { return values_of(*static_cast<Member*>(member)); },
+    [](void* member, std::size_t count) { return renew_array(*static_cast<Member*>(member), count); },
+    [] {
+        bool (*assign)(void*, const void*) = nullptr;
+        if constexpr (requires(Member & to, const Member& from) { copy_array(to, from); })
+            assign = [](void* member, const void* from) {
+                return copy_array(*static_cast<Member*>(member), *static_cast<const Member*>(from));
+            };
+        return assign;
+    }()};
+
+/** A row of the table of `Owner`. */
+template <typename Owner>
+struct Row : Field {};
 
 /** A row for `Member` of `Owner`; use QUO_FIELD. */
 template <typename Owner, auto Member, typename... Rules>
-constexpr Field<Owner> field(const char* name, Rules... rules) {
+constexpr Row<Owner> field(const char* name, Rules... rules) {
     using Value = std::remove_reference_t<decltype(std::declval<Owner&>().*Member)>;
-    Field<Owner> row;
+    using Entry = std::remove_extent_t<Value>;
+    Row<Owner> row;
     row.name = row.key = name;
-    if constexpr (std::is_array_v<Value>) {
-        using Entry = std::remove_extent_t<Value>;
-        row.address = [](Owner& object) -> void* { return object.*Member; };
-        if constexpr (std::same_as<Entry, char>) {
-            row.type = parElement::typeString;
-            row.fixed_count = 1;
-            row.room = std::extent_v<Value>;
-        } else {
-            row.type = number_type<Entry>();
-            row.fixed_count = static_cast<std::int32_t>(std::extent_v<Value>);
-        }
-    } else if constexpr (std::is_arithmetic_v<Value>) {
-        row.type = number_type<Value>();
-        row.fixed_count = 1;
-        row.address = [](Owner& object) -> void* { return &(object.*Member); };
+    row.member = [](void* owner) -> void* { return &(static_cast<Owner*>(owner)->*Member); };
+    if constexpr (std::is_arithmetic_v<Entry>) {
+        row.type = type_of<Entry>();
+        row.count = std::is_array_v<Value> && !std::same_as<Entry, char> ? int{std::extent_v<Value>} : 1;
+        if constexpr (std::same_as<Entry, char>) row.room = std::extent_v<Value>;
     } else {
-        using Entry = std::remove_pointer_t<decltype(data_of(std::declval<Value&>()))>;
-        row.type = number_type<Entry>();
-        row.address = [](Owner& object) -> void* { return data_of(object.*Member); };
-        row.allocate = [](Owner& object, std::size_t count) { return allocate_array(object.*Member, count); };
-        row.release = [](Owner& object) { release_array(object.*Member); };
+        row.type = type_of<std::remove_pointer_t<decltype(values_of(std::declval<Value&>()))>>();
+        row.array = &kArrayKind<Value>;
     }
-    (apply(row, rules), ...);
+    const auto apply = [&row](auto rule) {
+        if constexpr (std::convertible_to<decltype(rule), const char*>)
+            row.key = rule;
+        else
+            rule(row);
+    };
+    (apply(rules), ...);
     return row;
 }
 
@@ -303,139 +299,68 @@ constexpr Field<Owner> field(const char* name, Rules... rules) {
 template <typename Owner, std::size_t N>
 class FieldTable {
 public:
-    template <std::same_as<Field<Owner>>... Fields>
-    constexpr FieldTable(const char* section, Fields... fields) : section_{section}, fields_{fields...} {
-        for (const Field<Owner>& field : fields_) {
+    template <std::same_as<Row<Owner>>... Rows>
+    constexpr FieldTable(const char* section, Rows... rows) : section_{section}, fields_{rows...} {
+        for (const Field& field : fields_) {
             if (std::string_view{field.name}.size() >= sizeof(parElement::name)) throw "element name too long";
-            if (field.is_array_of_any_length() && field.per_length < 1) throw "array without QUO_LENGTH";
+            if (field.array && field.per_length < 1) throw "array without QUO_LENGTH";
+            if (field.most > 0 && !(field.array && field.array->assign)) throw "no vector, and not in XML";
+            if (field.most == 0 && size_++ != &field - fields_.data()) throw "element behind one that XML lacks";
         }
     }
 
-    [[nodiscard]] constexpr int size() const { return static_cast<int>(N); }
+    /** Number of elements. */
+    [[nodiscard]] constexpr int size() const { return size_; }
     [[nodiscard]] constexpr const char* section() const { return section_; }
     /** The row of an element, by its index; null beyond. */
-    [[nodiscard]] constexpr const Field<Owner>* row(int index) const {
+    [[nodiscard]] constexpr const Field* row(int index) const {
         return index >= 0 && index < size() ? &fields_[static_cast<std::size_t>(index)] : nullptr;
     }
 
-    /** The whole of refreshParameters(): registers every field and sets the allocation flag. */
-    void register_all(Owner& object) const {
-        for (const Field<Owner>& field : fields_) RegistryAccess::add(object, field.at(object));
-        RegistryAccess::set_allocated(object, true);
+    /** The object as a record; what follows is short for its operations. */
+    [[nodiscard]] Record of(Owner& object) const { return of(object, object); }
+    /** The same where the fields are members of another object than the registered one. */
+    [[nodiscard]] Record of(GeneralSAR_BaseXML& object, Owner& owner) const {
+        return {section_, fields_, object, &owner};
     }
-
-    /** createBuffers() for the arrays of the table: a length above 0 that the source cannot hold is refused (1), a
-     * failed allocation gives 7; neither leaves an array behind. */
-    [[nodiscard]] int create_buffers(Owner& object) const {
-        for (const Field<Owner>& field : fields_) {
-            if (!field.is_array_of_any_length()) continue;
-            const auto count = field.wanted_count(object);
-            if (!count || !RegistryAccess::can_hold(object, *count)) return release(object, QUO_REFUSED);
-            field.release(object);
-            if (*count > 0 && !field.allocate(object, static_cast<std::size_t>(*count)))
-                return release(object, QUO_NO_MEMORY);
-        }
-        RegistryAccess::refresh(object);
-        RegistryAccess::set_allocated(object, true);
-        return QUO_OK;
-    }
-
-    /** destroyBuffers() for the arrays of the table: released, their lengths 0, the allocation flag cleared. */
-    int destroy_buffers(Owner& object) const {
-        for (const Field<Owner>& field : fields_) {
-            if (!field.is_array_of_any_length()) continue;
-            field.release(object);
-            field.set_length(object, 0);
-        }
-        RegistryAccess::refresh(object);
-        RegistryAccess::set_allocated(object, false);
-        return QUO_OK;
-    }
-
-    /** Copies every field of `from` into `to`, whose arrays are made anew. 0, or the status of its
-     * createBuffers(). */
+    void register_all(Owner& object) const { of(object).register_all(); }
+    [[nodiscard]] int create_buffers(Owner& object) const { return of(object).create_buffers(); }
+    int destroy_buffers(Owner& object) const { return of(object).destroy_buffers(); }
     int copy(const Owner& from, Owner& to) const {
-        if (&from == &to) return QUO_OK;
-        auto& source = const_cast<Owner&>(from);  // only read: the rows hand out one kind of pointer
-        if (has_arrays()) to.destroyBuffers();
-        for (const Field<Owner>& field : fields_)
-            if (!field.is_array_of_any_length())
-                copy_values(field.type, field.fixed_count, field.room, field.address(source), field.address(to));
-        if (has_allocated(from)) {
-            if (const int status = to.createBuffers()) return status;
-            copy_arrays(from, to);
-        }
-        RegistryAccess::refresh(to);
-        return QUO_OK;
+        return of(to).copy(of(const_cast<Owner&>(from)));  // only read: the rows hand out one kind of pointer
     }
-
-    /** Reads the fields from the parameter file: single values and arrays of fixed size, then createBuffers(),
-     * then the arrays that it made. Every key is read, even after a failure. The file does not stay among the
-     * parameter files in memory.
-     * @return 0; 1, with the pending errors cleared, when a mandatory key failed, and with nothing read when the
-     * other form of the file was not found missing but could not be read. */
-    int read_profile(Owner& object, const char* file) const { return read_profile(object, file, section_); }
-    int read_profile(Owner& object, const char* file, const char* section) const {
-        if (RegistryAccess::unread(object) == QUO_OK && read_profile_fully(object, file, section)) return QUO_OK;
-        freeall_ckerr();
-        return QUO_REFUSED;
-    }
+    int read(Owner& object, const char* file) const { return of(object).read(file); }
+    int read_profile(Owner& object, const char* file) const { return of(object).read_profile(file, section_); }
 
 private:
-    bool read_profile_fully(Owner& object, const char* file, const char* section) const {
-        const ProfileLook look{file};
-        const bool complete = read_profile_part(object, file, section, false);
-        if (!has_arrays()) return complete;
-        RegistryAccess::set_source(object, file);
-        const bool arrays = object.createBuffers() == QUO_OK && read_profile_part(object, file, section, true);
-        RegistryAccess::set_source(object, nullptr);
-        return arrays && complete;
-    }
-    [[nodiscard]] int release(Owner& object, int status) const {
-        destroy_buffers(object);
-        return status;
-    }
-    [[nodiscard]] constexpr bool has_arrays() const {
-        return std::ranges::any_of(fields_, &Field<Owner>::is_array_of_any_length);
-    }
-    [[nodiscard]] bool has_allocated(const Owner& object) const {
-        return std::ranges::any_of(fields_, [&](const Field<Owner>& field) {
-            return field.is_array_of_any_length() && registered_array(object, field.name);
-        });
-    }
-    // Arrays are copied as they are registered: a length member may have been changed since they were allocated.
-    void copy_arrays(const Owner& from, Owner& to) const {
-        for (const Field<Owner>& field : fields_) {
-            if (!field.is_array_of_any_length()) continue;
-            const parElement *source = registered_array(from, field.name),
-                             *target = registered_array(to, field.name);
-            if (source && target && source->count == target->count)
-                copy_values(field.type, source->count, 0, source->pointer, target->pointer);
-        }
-    }
-    bool read_profile_part(Owner& object, const char* file, const char* section, bool arrays) const {
-        std::array<FieldValue, N> part;
-        std::size_t used = 0;
-        for (const Field<Owner>& field : fields_)
-            if (field.is_array_of_any_length() == arrays) part[used++] = field.at(object);
-        return read_profile_fields(std::span{part}.first(used), section, file);
-    }
-
     const char* section_;
-    std::array<Field<Owner>, N> fields_;
+    int size_ = 0;
+    std::array<Field, N> fields_;
 };
 
 template <typename Owner, typename... Rest>
-FieldTable(const char*, Field<Owner>, Rest...) -> FieldTable<Owner, 1 + sizeof...(Rest)>;
+FieldTable(const char*, Row<Owner>, Rest...) -> FieldTable<Owner, 1 + sizeof...(Rest)>;
 
 }  // namespace quo
 
 /** A row for a member of `Obj`, the class that the file's `using Obj = ...` names. After the member: the
- * parameter-file key where it differs, and rules (quo::bounds, quo::element, quo::kOptional,
- * quo::kProfileOptional, quo::kXmlOnly, QUO_LENGTH; for checks alone quo::between, quo::at_least, quo::above,
- * quo::one_of, quo::kFilled, quo::kDate). */
+ * parameter-file key where it differs, and rules (quo::bounds, quo::element, quo::note, quo::kOptional,
+ * quo::kProfileOptional, quo::kXmlOnly, quo::profile_only, quo::in_memory_only, QUO_LENGTH; for checks alone
+ * quo::between, quo::at_least, quo::above, quo::one_of, quo::kFilled, quo::kDate). */
 #define QUO_FIELD(member, ...) quo::field<Obj, &Obj::member>(#member __VA_OPT__(, ) __VA_ARGS__)
 /** Rule of an array member: its length is an int32_t member of `Obj`, times an optional number of values each. */
 #define QUO_LENGTH(member, ...) quo::length<Obj, &Obj::member>(__VA_ARGS__)
+
+/** What a class with a table defines: how it is made and registered, and where a header holds it as one section,
+ * how it is copied, read and written too. */
+#define QUO_RECORD(Class, table)                             \
+    Class::Class() { createElementsVector((table).size()); } \
+    void Class::refreshParameters() { (table).register_all(*this); }
+#define QUO_HEADER_RECORD(Class, table)                                        \
+    QUO_RECORD(Class, table)                                                   \
+    /* NOLINTNEXTLINE(bugprone-macro-parentheses): a type takes none */        \
+    int Class::clone(Class* to) const { return (table).copy(*this, *to); }     \
+    int Class::readhdr(const char* file) { return (table).read(*this, file); } \
+    int Class::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, (table).section()); }
 
 #endif

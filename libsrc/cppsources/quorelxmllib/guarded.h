@@ -7,9 +7,10 @@
 
 namespace quo {
 
-/** Runs an operation whose only exception is a failed allocation, which becomes the reported status 7. */
+/** Runs an operation whose only exception of the language is a failed allocation, which becomes the reported
+ * status 7. A quorelException, which is none of these, passes. */
 template <typename Operation>
-int guarded(CallerFrame frame, Operation operation) noexcept {
+int guarded(CallerFrame frame, Operation operation) {
     try {
         return operation();
     } catch (const std::exception&) {

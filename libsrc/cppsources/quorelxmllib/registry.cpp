@@ -6,13 +6,11 @@
 
 #include "diagnosticslib/call_frame.h"
 #include "quo_base/quorelxml_v2.h"
-#include "quorelxmllib/field_table.h"
 #include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_document.h"
 #include "quorelxmllib/header_session.h"
 #include "quorelxmllib/xml_text.h"
 #include "sarutillib/bounded_text.h"
-#include "sarutillib/file_io.h"
 
 using quo::CallFrame;
 using quo::guarded;
@@ -27,6 +25,11 @@ constexpr std::size_t kNameRoom = 512;
 std::span<char* const> texts_of(const parElement& element, char* const& single) {
     if (!element.text_array) return {&single, 1};
     return {static_cast<char* const*>(element.pointer), static_cast<std::size_t>(element.count)};
+}
+
+template <typename T>
+T* numbers_of(const parElement& element) {
+    return static_cast<T*>(element.pointer);
 }
 
 /** Whether an element's status fails the whole read: one that found no memory is not known to be missing. */
@@ -143,17 +146,16 @@ int GeneralSAR_BaseXML::addElementString(const char* name, char* text, bool mand
 
 int GeneralSAR_BaseXML::addElementText(const char* name, char* text, std::size_t room, bool mandatory) {
     const int slot = cursor_;
-    if (const int status = addElement(name, text, parElement::typeString, 1, 0.0, 0.0, mandatory)) return status;
-    elements_[slot].room = room;
-    return QUO_OK;
+    const int status = addElement(name, text, parElement::typeString, 1, 0.0, 0.0, mandatory);
+    if (status == QUO_OK) elements_[slot].room = room;
+    return status;
 }
 
 int GeneralSAR_BaseXML::addElementString(const char* name, char** texts, int count, bool mandatory) {
     const int slot = cursor_;
-    if (const int status = addElement(name, texts, parElement::typeString, count, 0.0, 0.0, mandatory))
-        return status;
-    elements_[slot].text_array = true;
-    return QUO_OK;
+    const int status = addElement(name, texts, parElement::typeString, count, 0.0, 0.0, mandatory);
+    if (status == QUO_OK) elements_[slot].text_array = true;
+    return status;
 }
 
 bool GeneralSAR_BaseXML::sourceCanHold(std::int64_t count) const noexcept {
@@ -226,7 +228,7 @@ bool GeneralSAR_BaseXML::getConfigurationFile(const char* file, int channel, con
 // --- writing ----------------------------------------------------------------------------------------------------
 
 bool GeneralSAR_BaseXML::textsCanBeStored() const {
-    return std::all_of(elements_, elements_ + element_count_, [](const parElement& element) {
+    return std::ranges::all_of(elements(), [](const parElement& element) {
         if (element.type != parElement::typeString || element.count < 1) return true;
         char* const single = static_cast<char*>(element.pointer);
         return std::ranges::all_of(texts_of(element, single), [](const char* text) {
@@ -236,21 +238,18 @@ bool GeneralSAR_BaseXML::textsCanBeStored() const {
 }
 
 int GeneralSAR_BaseXML::writeElement(const parElement& element) {
-    const std::string field = section_ + '/' + element.name;
+    const std::string path = section_ + '/' + element.name;
+    const char* const field = path.c_str();
+    char* const single = static_cast<char*>(element.pointer);
     switch (element.type) {
         case parElement::typeDouble:
-            return document_.writeDouble(channel_, field.c_str(), static_cast<const double*>(element.pointer),
-                                         element.count);
+            return document_.writeDouble(channel_, field, numbers_of<double>(element), element.count);
         case parElement::typeFloat:
-            return document_.writeFloat(channel_, field.c_str(), static_cast<const float*>(element.pointer),
-                                        element.count);
+            return document_.writeFloat(channel_, field, numbers_of<float>(element), element.count);
         case parElement::typeInt:
-            return document_.writeInt(channel_, field.c_str(), static_cast<const std::int32_t*>(element.pointer),
-                                      element.count);
-        case parElement::typeString: {
-            char* const single = static_cast<char*>(element.pointer);
-            return document_.writeString(channel_, field.c_str(), texts_of(element, single).data(), element.count);
-        }
+            return document_.writeInt(channel_, field, numbers_of<std::int32_t>(element), element.count);
+        case parElement::typeString:
+            return document_.writeString(channel_, field, texts_of(element, single).data(), element.count);
         case parElement::typeNone:
             break;
     }
@@ -259,9 +258,9 @@ int GeneralSAR_BaseXML::writeElement(const parElement& element) {
 
 int GeneralSAR_BaseXML::writeSection() {
     if (const int status = cleanAuxiliaryFile()) return status;
-    for (int i = 0; i < element_count_; ++i)
-        if (elements_[i].count > 0)
-            if (const int status = writeElement(elements_[i])) return status;
+    for (const parElement& element : elements())
+        if (element.count > 0)
+            if (const int status = writeElement(element)) return status;
     return QUO_OK;
 }
 
@@ -295,19 +294,18 @@ int GeneralSAR_BaseXML::writeAuxiliaryFile(const char* file, int channel, const 
 // --- reading ----------------------------------------------------------------------------------------------------
 
 int GeneralSAR_BaseXML::readElement(const parElement& element, int count) {
-    const std::string field = section_ + '/' + element.name;
+    const std::string path = section_ + '/' + element.name;
+    const char* const field = path.c_str();
+    char* const single = static_cast<char*>(element.pointer);
     switch (element.type) {
         case parElement::typeDouble:
-            return document_.readDouble(channel_, field.c_str(), static_cast<double*>(element.pointer), count);
+            return document_.readDouble(channel_, field, numbers_of<double>(element), count);
         case parElement::typeFloat:
-            return document_.readFloat(channel_, field.c_str(), static_cast<float*>(element.pointer), count);
+            return document_.readFloat(channel_, field, numbers_of<float>(element), count);
         case parElement::typeInt:
-            return document_.readInt(channel_, field.c_str(), static_cast<std::int32_t*>(element.pointer), count);
-        case parElement::typeString: {
-            char* const single = static_cast<char*>(element.pointer);
-            return document_.readString(channel_, field.c_str(), texts_of(element, single).data(), count,
-                                        element.room);
-        }
+            return document_.readInt(channel_, field, numbers_of<std::int32_t>(element), count);
+        case parElement::typeString:
+            return document_.readString(channel_, field, texts_of(element, single).data(), count, element.room);
         case parElement::typeNone:
             break;
     }
@@ -315,11 +313,9 @@ int GeneralSAR_BaseXML::readElement(const parElement& element, int count) {
 }
 
 int GeneralSAR_BaseXML::readScalars(bool& lengths_changed) {
-    for (int i = 0; i < element_count_; ++i) {
-        const parElement& element = elements_[i];
+    for (const parElement& element : elements()) {
         if (!element.scalar || element.type == parElement::typeString) continue;
-        const auto* length =
-            element.type == parElement::typeInt ? static_cast<std::int32_t*>(element.pointer) : nullptr;
+        const auto* length = element.type == parElement::typeInt ? numbers_of<std::int32_t>(element) : nullptr;
         const std::int32_t before = length ? *length : 0;
         const int status = readElement(element, 1);
         lengths_changed = lengths_changed || (length && *length != before);
@@ -329,15 +325,13 @@ int GeneralSAR_BaseXML::readScalars(bool& lengths_changed) {
 }
 
 bool GeneralSAR_BaseXML::hasArrays() const noexcept {
-    return std::any_of(elements_, elements_ + element_count_,
-                       [](const parElement& element) { return !element.scalar && element.count > 0; });
+    return std::ranges::any_of(elements(),
+                               [](const auto& element) { return !element.scalar && element.count > 0; });
 }
 
 int GeneralSAR_BaseXML::readEverything() {
-    for (int i = 0; i < element_count_; ++i) {
-        const parElement& element = elements_[i];
-        if (element.count < 1) continue;
-        const int status = readElement(element, element.count);
+    for (const parElement& element : elements()) {
+        const int status = element.count > 0 ? readElement(element, element.count) : QUO_OK;
         if (fails_read(element, status)) return status;
     }
     return QUO_OK;
@@ -348,10 +342,11 @@ int GeneralSAR_BaseXML::readSection() {
     const int scalars = readScalars(lengths_changed);
     // Also after a failure: a length that was read must never stand beside an array of another length.
     const bool create = scalars == QUO_OK || (lengths_changed && hasArrays());
-    const int created = create ? createBuffers() : QUO_REFUSED;
-    if (create && created != QUO_OK) (void)destroyBuffers();
+    const int created = create ? createBuffers() : QUO_OK;
+    out_of_buffers_ = created == QUO_NO_MEMORY;
+    if (created != QUO_OK) (void)destroyBuffers();
     if (scalars != QUO_OK) return scalars;
-    if (created != QUO_OK) return created == QUO_NO_MEMORY ? created : QUO_REFUSED;
+    if (created != QUO_OK) return out_of_buffers_ ? QUO_NO_MEMORY : QUO_REFUSED;
     return allocated_ ? readEverything() : QUO_REFUSED;
 }
 
@@ -368,6 +363,7 @@ int GeneralSAR_BaseXML::readAuxiliaryFile() noexcept {
 
 bool GeneralSAR_BaseXML::readAuxiliaryFile(const char* file, int channel, const char* section) noexcept {
     CallFrame frame{"GeneralSAR_BaseXML::readAuxiliaryFile", kSource};
+    out_of_buffers_ = false;
     int status = setAuxiliaryFile(file, channel, section);
     if (status == QUO_OK) status = readAuxiliaryFile();
     (void)unsetAuxiliaryFile();
@@ -392,35 +388,3 @@ int GeneralSAR_Base::writehdr() { return QUO_OK; }
 int GeneralSAR_Base::writehdr(const char*) { return QUO_OK; }
 
 int GeneralSAR_Base::readhdr(const char*) { return QUO_OK; }
-
-// --- the way in for tables --------------------------------------------------------------------------------------
-
-namespace quo {
-
-void RegistryAccess::add(GeneralSAR_BaseXML& object, const FieldValue& field) {
-    if (object.cursor_ < object.element_count_) object.elements_[object.cursor_].rule = field.rule;
-    if (field.type == parElement::typeString)
-        (void)object.addElementText(field.name, static_cast<char*>(field.pointer), field.room, field.mandatory);
-    else
-        (void)object.addElement(field.name, field.pointer, field.type, field.count, field.minimum, field.maximum,
-                                field.mandatory);
-}
-
-void RegistryAccess::set_allocated(GeneralSAR_BaseXML& object, bool allocated) {
-    (void)object.setAllocationFlag(allocated);
-}
-
-void RegistryAccess::refresh(GeneralSAR_BaseXML& object) { object.refreshParameters(); }
-
-bool RegistryAccess::can_hold(const GeneralSAR_BaseXML& object, std::int64_t count) {
-    return object.sourceCanHold(count);
-}
-
-int RegistryAccess::unread(const GeneralSAR_BaseXML& object) { return object.unread_; }
-
-void RegistryAccess::set_source(GeneralSAR_BaseXML& object, const char* file) {
-    object.source_length_ = file ? file_length(file).value_or(0) : -1;
-    CallFrame::drop_errno();
-}
-
-}  // namespace quo

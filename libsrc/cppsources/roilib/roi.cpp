@@ -14,7 +14,7 @@ constexpr const char* kSource = "roi";
 
 namespace roi {
 using Obj = ROI_Obj;
-// Deliberate: in a parameter file only the last key decides whether the region could be read.
+// In a parameter file only the last key decides whether the region could be read.
 constexpr quo::FieldTable kTable{
     "ROI",
     QUO_FIELD(SlowStartTime, quo::kProfileOptional),
@@ -50,9 +50,7 @@ int shared_intervals(const Axis& a, const Axis& b, double start) {
 
 }  // namespace
 
-ROI_Obj::ROI_Obj() { createElementsVector(roi::kTable.size()); }
-
-void ROI_Obj::refreshParameters() { roi::kTable.register_all(*this); }
+QUO_RECORD(ROI_Obj, roi::kTable)
 
 int ROI_Obj::SetFastAxe(double start, double delta, int n) {
     FastStartTime = start;
@@ -98,11 +96,11 @@ ROI_Time ROI_Obj::GetCenter() const {
 }
 
 int ROI_Obj::read_roi(const char* file, const char* name) {
-    return readAuxiliaryFile(file, 1, name) ? QUO_OK : roi::kTable.read_profile(*this, file, name);
+    return readAuxiliaryFile(file, 1, name) ? QUO_OK : roi::kTable.of(*this).read_profile(file, name);
 }
 
 int ROI_Obj::write_roi(const char* file, const char* name) {
-    writeAuxiliaryFile(file, 1, name);  // deliberate: the outcome stands in the report alone
+    writeAuxiliaryFile(file, 1, name);  // callers rely on 0: the outcome stands in the report alone
     return QUO_OK;
 }
 
@@ -144,18 +142,7 @@ int FileROI_Obj::read_roi() {
     return frame.success();
 }
 
-ROI_Coords::ROI_Coords() { createElementsVector(coords::kTable.size()); }
-
-void ROI_Coords::refreshParameters() { coords::kTable.register_all(*this); }
-
-int ROI_Coords::readhdr(const char* file) {
-    return readAuxiliaryFile(file, 1, coords::kTable.section()) ? QUO_OK
-                                                                : coords::kTable.read_profile(*this, file);
-}
-
-int ROI_Coords::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, coords::kTable.section()); }
-
-int ROI_Coords::clone(ROI_Coords* to) const { return coords::kTable.copy(*this, *to); }
+QUO_HEADER_RECORD(ROI_Coords, coords::kTable)
 
 int ROI_Coords::GetROI(const ROI_Obj* image, ROI_Obj* out) const {
     quo::CallFrame frame{"ROI_Coords::GetROI", kSource};

@@ -123,13 +123,18 @@ RasterDescription::RasterDescription() { createElementsVector(kDescriptionElemen
 RasterDescription::~RasterDescription() = default;
 
 void RasterDescription::refreshParameters() {
-    addElementInt("NrOfLinesPerImage", &NrOfLinesPerImage, 1, 0, 0, true);
-    addElementInt("NrOfPixelsPerLine", &NrOfPixelsPerLine, 1, 0, 0, true);
-    addElementInt("HeaderOffset", &stored_offset_, 1, 0, 0, true);
-    addElementInt("RowPrefix", &RowPrefix, 1, 0, 0, true);
-    addElementInt("ByteOrder", &ByteOrder, 1, 0, 0, true);
-    addElementInt("CellType", &CellType, 1, 0, 0, true);
-    setAllocationFlag(true);
+    using Obj = RasterDescription;
+    static constexpr quo::FieldTable kTable{
+        kSection,
+        QUO_FIELD(NrOfLinesPerImage),
+        QUO_FIELD(NrOfPixelsPerLine),
+        QUO_FIELD(stored_offset_, quo::element("HeaderOffset")),
+        QUO_FIELD(RowPrefix),
+        QUO_FIELD(ByteOrder),
+        QUO_FIELD(CellType),
+    };
+    static_assert(kTable.size() == kDescriptionElements);
+    kTable.register_all(*this);
 }
 
 int RasterDescription::element_sizeof() const { return static_cast<int>(quo::sample_size(CellType)); }
@@ -367,7 +372,7 @@ int DataFile::read_hdr(const char* file_name) {
     return quo::guarded(frame, [&] {
         const std::string side_file = sideFile();
         if (readSection(side_file.c_str()) == QUO_OK) return frame.success();
-        if (quo::RegistryAccess::unread(*this) == QUO_NO_MEMORY) return frame.callee(QUO_NO_MEMORY);
+        if (quo::Record::unread(*this) == QUO_NO_MEMORY) return frame.callee(QUO_NO_MEMORY);
         if (!read_profile(*this, side_file.c_str()))
             return frame.fail(QUO_REFUSED, "The raster's side file is incomplete");
         return frame.success();

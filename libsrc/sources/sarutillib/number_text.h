@@ -24,6 +24,13 @@ NumberText format_general(double value, int precision) noexcept;
 NumberText format_exact(double value) noexcept;
 NumberText format_int(std::int64_t value) noexcept;
 
+/** The text without the white space around it. */
+constexpr std::string_view trimmed(std::string_view text) noexcept {
+    constexpr std::string_view kBlanks = " \t\r\n";
+    const auto first = text.find_first_not_of(kBlanks);
+    return first == text.npos ? "" : text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
+}
+
 /** What a scan of a number found: the value, and the characters it took (0: no number stands there, value 0). */
 template <typename T>
 struct Scanned {

@@ -1,8 +1,6 @@
 #include "field_check.h"
 
-#include <cstdint>
-
-#include "number.h"
+#include <type_traits>
 
 namespace tool {
 namespace {
@@ -20,20 +18,14 @@ bool is_unknown(const parElement& fresh, int index, std::string_view text) {
 }  // namespace
 
 std::string value_text(const parElement& element, int index) {
-    switch (element.type) {
-        case parElement::typeDouble:
-            return exact(static_cast<const double*>(element.pointer)[index]);
-        case parElement::typeFloat:
-            return exact(as_written(static_cast<const float*>(element.pointer)[index]));
-        case parElement::typeInt:
-            return std::to_string(static_cast<const std::int32_t*>(element.pointer)[index]);
-        case parElement::typeString:
-            return element.text_array ? static_cast<char* const*>(element.pointer)[index]
-                                      : static_cast<const char*>(element.pointer);
-        case parElement::typeNone:
-            break;
-    }
-    return "";
+    return with_value(element, index, [](auto value) -> std::string {
+        if constexpr (std::is_floating_point_v<decltype(value)>)
+            return exact(value);
+        else if constexpr (std::is_integral_v<decltype(value)>)
+            return std::to_string(value);
+        else
+            return value;
+    });
 }
 
 std::string value_defect(const parElement& element, const parElement& fresh, int index, std::string_view text) {

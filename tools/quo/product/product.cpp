@@ -1,6 +1,5 @@
 #include "product.h"
 
-#include <array>
 #include <cmath>
 
 #include "document.h"
@@ -9,21 +8,6 @@
 
 namespace tool {
 namespace {
-
-constexpr std::array<const char*, GeneralSAR::kObjects> kSections{"raster side file",
-                                                                  "ROI",
-                                                                  "PolySAR",
-                                                                  "SamplingConstants",
-                                                                  "StateVectorData",
-                                                                  "StateVectorData",
-                                                                  "Pulse",
-                                                                  "AntennaPattern",
-                                                                  "DataSetInfo",
-                                                                  "SensorAttitude",
-                                                                  "SpectralWindows",
-                                                                  "GroundCornersPoints",
-                                                                  "SwathInfo",
-                                                                  "RasterInfo"};
 
 bool is_known(const geopoint& point) {
     return std::abs(point.Latitude) <= 90.0 && std::abs(point.Longitude) <= 360.0;
@@ -42,21 +26,21 @@ void read_product(const std::string& header, GeneralSAR& product) {
     refuse_header(header, QUO_OK, "holds no object of a product");
 }
 
-const char* section_of(GSObject object) { return kSections[static_cast<std::size_t>(object)]; }
-
 const GeneralSAR_Base& elements_of(GeneralSAR& product, GSObject object) {
     return object == gsRoi ? product.roi.Roi : *product.GSget(object);
 }
 
+const char* section_of(GeneralSAR& product, GSObject object) {
+    const parElement* element = elements_of(product, object).element(0);
+    return element != nullptr ? element->section : "";
+}
+
 const parElement* element_at(GeneralSAR& product, std::string_view field) {
-    const auto slash = field.find('/');
-    if (slash == std::string_view::npos) return nullptr;
     for (int i = gsRoi; i < GeneralSAR::kObjects; ++i) {
-        const auto object = static_cast<GSObject>(i);
-        if (field.substr(0, slash) != section_of(object)) continue;
-        const GeneralSAR_Base& elements = elements_of(product, object);
+        const GeneralSAR_Base& elements = elements_of(product, static_cast<GSObject>(i));
         for (int k = 0; k < elements.elementCount(); ++k) {
-            if (field.substr(slash + 1) == elements.element(k)->name) return elements.element(k);
+            const parElement& element = *elements.element(k);
+            if (field == std::string{element.section} + "/" + element.name) return &element;
         }
     }
     return nullptr;

@@ -13,11 +13,10 @@ namespace tool {
 /** Reads a product header. Throws Failure where the file cannot be read or holds no object of a product. */
 void read_product(const std::string& header, GeneralSAR& product);
 
-/** The sections that a product's objects stand in, in the order of GSObject. */
-const char* section_of(GSObject object);
-
 /** What object `object` registers in its section; for the region, what the region itself does. */
 const GeneralSAR_Base& elements_of(GeneralSAR& product, GSObject object);
+/** The section that these stand in. */
+const char* section_of(GeneralSAR& product, GSObject object);
 /** The same, or null, for the element at a path such as "SamplingConstants/prf_hz". */
 const parElement* element_at(GeneralSAR& product, std::string_view field);
 /** Whether a field is known to hold numbers. */

@@ -12,6 +12,7 @@
 #include "commands.h"
 #include "document.h"
 #include "failure.h"
+#include "field_check.h"
 #include "number.h"
 #include "output.h"
 #include "quo_base/generalSAR_configuration.h"
@@ -24,7 +25,6 @@ using Record = GeneralSAR_ConfigurationRecord;
 using Json = nlohmann::ordered_json;
 
 constexpr int kChannel = 1;
-constexpr const char* kShared = "generalProcessingConf";
 constexpr double kNoBound = 1e30;  // bounds of this size and above stand for none
 
 struct ConfigOptions {
@@ -35,26 +35,18 @@ struct ConfigOptions {
 
 // --- parameters -------------------------------------------------------------------------------------------------
 
-/** One parameter: of a record, or of those that all processors share. */
-struct Parameter {
-    parElement element;
-    const char *unit, *meaning;
-};
+using Parameters = std::vector<parElement>;
 
-std::vector<Parameter> parameters_of(const Record& record) {
-    std::vector<Parameter> parameters;
-    parameters.reserve(static_cast<std::size_t>(record.elementCount()));
-    for (int i = 0; i < record.elementCount(); ++i)
-        parameters.push_back({*record.element(i), record.unit(i), record.meaning(i)});
+Parameters parameters_of(const Record& record) {
+    Parameters parameters;
+    for (int i = 0; i < record.elementCount(); ++i) parameters.push_back(*record.element(i));
     return parameters;
 }
 
-std::vector<Parameter> shared_parameters(GeneralSAR_BaseConfiguration& configuration) {
-    std::vector<Parameter> parameters;
-    parameters.reserve(GeneralSAR_BaseConfiguration::kSharedParameters);
+Parameters shared_parameters(GeneralSAR_BaseConfiguration& configuration) {
+    Parameters parameters;
     for (int i = 0; i < GeneralSAR_BaseConfiguration::kSharedParameters; ++i)
-        parameters.push_back({configuration.sharedParameter(i), GeneralSAR_BaseConfiguration::sharedUnit(i),
-                              GeneralSAR_BaseConfiguration::sharedMeaning(i)});
+        parameters.push_back(configuration.sharedParameter(i));
     return parameters;
 }
 
@@ -67,19 +59,7 @@ std::unique_ptr<Record> record_of(const std::string& name) {
 }
 
 Json value_at(const parElement& element, int i) {
-    switch (element.type) {
-        case parElement::typeDouble:
-            return static_cast<const double*>(element.pointer)[i];
-        case parElement::typeFloat:
-            return as_written(static_cast<const float*>(element.pointer)[i]);
-        case parElement::typeInt:
-            return static_cast<const std::int32_t*>(element.pointer)[i];
-        case parElement::typeString:
-            return static_cast<const char*>(element.pointer);
-        case parElement::typeNone:
-            break;
-    }
-    return nullptr;
+    return with_value(element, i, [](auto value) { return Json(value); });
 }
 
 Json values_of(const parElement& element) {
@@ -143,11 +123,11 @@ private:
     std::vector<Row> rows_;
 };
 
-std::string described(const std::string& heading, const std::vector<Parameter>& parameters) {
+std::string described(const std::string& heading, const Parameters& parameters) {
     MarkdownTable table{{"parameter", "type", "unit", "bounds", "default", "meaning"}};
-    for (const auto& [element, unit, meaning] : parameters)
-        table.add(
-            {element.name, type_of(element), unit, bounds_of(element), text_of(values_of(element)), meaning});
+    for (const parElement& element : parameters)
+        table.add({element.name, type_of(element), element.unit, bounds_of(element), text_of(values_of(element)),
+                   element.meaning});
     return "### " + heading + "\n\n" + table.text();
 }
 
@@ -245,19 +225,18 @@ int write_new(const ConfigOptions& options) {
 /** What a file says, section by section, with what differs from the defaults. */
 class Listing {
 public:
-    void add(const std::string& section, const std::vector<Parameter>& values,
-             const std::vector<Parameter>& defaults) {
+    void add(const std::string& section, const Parameters& values, const Parameters& defaults) {
         text_ += (text_.empty() ? "[" : "\n[") + section + "]\n";
-        for (std::size_t i = 0; i < values.size(); ++i) add_value(section, values[i], defaults[i].element);
+        for (std::size_t i = 0; i < values.size(); ++i) add_value(section, values[i], defaults[i]);
     }
     [[nodiscard]] std::string text() const { return text_; }
     [[nodiscard]] const Json& json() const { return json_; }
 
 private:
-    void add_value(const std::string& section, const Parameter& parameter, const parElement& fresh) {
+    void add_value(const std::string& section, const parElement& parameter, const parElement& fresh) {
         constexpr std::size_t kColumn = 32;
-        const Json value = values_of(parameter.element), usual = values_of(fresh);
-        const std::string name = parameter.element.name;
+        const Json value = values_of(parameter), usual = values_of(fresh);
+        const std::string name = parameter.name;
         json_[section][name] = value;
         text_ += name + std::string(kColumn - std::min(kColumn - 1, name.size()), ' ') + text_of(value);
         if (*parameter.unit != '\0') text_ += std::string{" "} + parameter.unit;
@@ -274,7 +253,7 @@ int show(const ConfigOptions& options) {
     if (review.records.empty()) throw Failure(options.file + ": holds no record");
     Listing listing;
     GeneralSAR_BaseConfiguration shared, fresh_shared;
-    shared.readConf(options.file.c_str(), kChannel, kShared);
+    shared.readConf(options.file.c_str(), kChannel, shared.sharedParameter(0).section);
     listing.add("shared", shared_parameters(shared), shared_parameters(fresh_shared));
     int status = kFine;
     for (const std::string& name : review.records) {

@@ -65,10 +65,11 @@ private:
 
     void check_presence() {
         for (const GSObject object : {gsSamplingConstants, gsDataSetInfo, gsOrbit, gsBufferFile}) {
-            const auto noted = [=](const Finding& finding) { return finding.object == section_of(object); };
+            const char* section = section_of(product_, object);
+            const auto noted = [=](const Finding& finding) { return finding.object == section; };
             const bool there = has(object) || (object == gsBufferFile && described_raster(product_) != nullptr);
             if (!there && std::ranges::none_of(findings_, noted)) {
-                warn(section_of(object), "-", "is missing");
+                warn(section, "-", "is missing");
             }
         }
     }
@@ -83,7 +84,7 @@ private:
         }
     }
     void check_section(Document& document, GSObject object) {
-        const char* section = section_of(object);
+        const char* section = section_of(product_, object);
         const int times = document.count(section);
         if (times < 1) return;
         if (times > 1) warn(section, "-", "stands " + std::to_string(times) + " times");
@@ -94,7 +95,7 @@ private:
             const parElement& element = *elements.element(k);
             const std::string path = std::string{section} + "/" + element.name;
             if (document.has(path)) {
-                check_texts(document, section, element, *defaults.element(k), path);
+                check_texts(document, element, *defaults.element(k), path);
             } else if (element.mandatory) {
                 error(section, element.name, "is missing");
                 complete = false;
@@ -112,15 +113,15 @@ private:
         }
     }
     // The texts as they stand, of which reading takes what it can.
-    void check_texts(Document& document, const char* section, const parElement& element, const parElement& fresh,
+    void check_texts(Document& document, const parElement& element, const parElement& fresh,
                      const std::string& path) {
         const bool array = document.is_array(path);
         const bool listed = element.count > 1 && !array;  // "1.5, 2.5", the older form of arrays
         if (listed) return;
         if (!array && element.scalar && document.count(path) > 1)
-            return error(section, element.name, element.countDefect(count_of(document, path)));
+            return error(element.section, element.name, element.countDefect(count_of(document, path)));
         const std::string defect = values_defect(element, fresh, document.values(path));
-        if (!defect.empty()) error(section, element.name, defect);
+        if (!defect.empty()) error(element.section, element.name, defect);
     }
     static std::size_t count_of(const Document& document, const std::string& path) {
         return static_cast<std::size_t>(document.count(path));
@@ -134,13 +135,13 @@ private:
             const GeneralSAR_Base& values = elements_of(product_, object);
             const GeneralSAR_Base& defaults = elements_of(fresh_, object);
             for (int k = 0; k < values.elementCount(); ++k)
-                check_element(section_of(object), *values.element(k), *defaults.element(k));
+                check_element(*values.element(k), *defaults.element(k));
         }
     }
-    void check_element(const char* section, const parElement& element, const parElement& fresh) {
+    void check_element(const parElement& element, const parElement& fresh) {
         for (int i = 0; i < element.count; ++i) {
             const std::string defect = value_defect(element, fresh, i, value_text(element, i));
-            if (!defect.empty()) return error(section, element.name, defect);
+            if (!defect.empty()) return error(element.section, element.name, defect);
         }
     }
 
