@@ -10,6 +10,7 @@
 #include "quo_base/generalSAR_configuration.h"
 #include "quorelxmllib/header_document.h"
 #include "quorelxmllib/header_session.h"
+#include "sarutillib/number_text.h"
 
 namespace {
 
@@ -19,13 +20,6 @@ constexpr const char* kSource = "generalSAR_configuration";
 
 using quo::HeaderTree;
 using quo::Node;
-
-std::string_view trimmed(std::string_view text) {
-    constexpr std::string_view kBlanks = " \t\r\n";
-    const auto first = text.find_first_not_of(kBlanks);
-    if (first == std::string_view::npos) return {};
-    return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
-}
 
 /** Goes through the values of an array as they are read: `val` elements, or else one list. */
 class ArrayCheck {
@@ -47,7 +41,7 @@ private:
         if (reason_.empty()) reason_ = element_.defect(text);
     }
     void see_list(std::string_view list) {
-        while (!trimmed(list).empty()) {
+        while (!quo::trimmed(list).empty()) {
             const auto comma = list.find(',');
             see(list.substr(0, comma));
             list = comma == std::string_view::npos ? std::string_view{} : list.substr(comma + 1);
