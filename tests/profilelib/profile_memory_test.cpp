@@ -5,7 +5,7 @@
 
 #include "quo_base/profile.h"
 #include "support/diagnostics.h"
-#include "support/failing_new.h"
+#include "support/failing_memory.h"
 
 namespace {
 
@@ -13,7 +13,7 @@ TEST(ProfileMemory, TellsGrowthFromAFirstAllocation) {
     constexpr const char* kMessages[] = {"Memory allocation failure\n", "Memory re-allocation failure\n"};
     static const int values[5000] = {};
     for (const int room : {0, 1})
-        EXPECT_EXIT((GetSetProfileChar(1, "s", "k", "", "/nowhere/a.par"), test::fail_news(room),
+        EXPECT_EXIT((GetSetProfileChar(1, "s", "k", "", "/nowhere/a.par"), test::refuse_memory(room),
                      WriteMyProfileIntArray("s", "k", values, 5000, "/nowhere/a.par")),
                     testing::ExitedWithCode(1), testing::Eq(kMessages[room]));
 }
@@ -43,10 +43,10 @@ TEST(ProfileSize, IsLessThanEightTimesTheFile) {
             std::string text = "[s]\n";
             for (unsigned i = 0; i < lines; ++i) text += line(i);
             test::write_text(path, text);
-            test::watch_news();
+            test::watch_memory();
             GetSetProfileChar(1, "t", "k", "v", path.c_str());
             SyncProfile(path.c_str());
-            EXPECT_LT(static_cast<double>(test::most_news()) / static_cast<double>(text.size()), 8.0)
+            EXPECT_LT(static_cast<double>(test::most_memory()) / static_cast<double>(text.size()), 8.0)
                 << lines << " times " << line(17);
             FreeProfile(path.c_str());
         }
