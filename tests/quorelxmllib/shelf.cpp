@@ -1,7 +1,7 @@
 #include "shelf.h"
 
-#include "header_files.h"
 #include "quorelxmllib/field_table.h"
+#include "support/diagnostics.h"
 #include "support/fields.h"
 
 namespace test {
@@ -44,30 +44,6 @@ void Shelf::fill(int books) {
 
 bool Shelf::operator==(const Shelf& other) const { return differing_fields(*this, other).empty(); }
 
-std::string Shelf::text() {
-    return header_text(R"(    <Shelf>
-      <pages>
-        <val N="1">1.5</val>
-        <val N="2">2.5</val>
-        <val N="3">3.5</val>
-        <val N="4">4.5</val>
-        <val N="5">5.5</val>
-        <val N="6">6.5</val>
-      </pages>
-      <width>2.25</width>
-      <height>0.5</height>
-      <boards>3</boards>
-      <label>Novels</label>
-      <code>N-1</code>
-      <corner_m>1.5, 2.5, 3.5, 4.5</corner_m>
-      <shape>
-        <val N="1">1</val>
-        <val N="2">2</val>
-      </shape>
-      <nBooks>2</nBooks>
-      <ConfigurationFile>/etc/shelf.conf</ConfigurationFile>
-    </Shelf>
-)");
-}
+std::string Shelf::text() { return read_text(QUO_TEST_DATA "/headers/shelf.xml"); }
 
 }  // namespace test
