@@ -60,6 +60,7 @@ std::vector<std::string> hostile_files() {
         with_declarations("<!ENTITY % e SYSTEM \"file:///etc/hostname\"> %e;", "1.5"),
         with_declarations("<!ATTLIST Channel Number CDATA \"1\">", "1.5"),
         with_declarations("<!ELEMENT width (#PCDATA|x)*>", "1.5"),
+        with_declarations("<!NOTATION n SYSTEM \"n\">", "1.5"),
         spliced("&unknown;"),
         header_text(repeated("<a>", 400) + repeated("</a>", 400)),
         header_text(repeated("<a>", 300000)),

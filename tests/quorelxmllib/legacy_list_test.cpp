@@ -22,13 +22,12 @@ using quo::scan_list;
 TEST(ListFormat, RepeatsTheItemAndEndsWithTheLast) {
     const char* const expected[] = {"%.15g, %.15g, %.15g", "%.15g, %.15g, %.15g", "%d, %d, %d", "%s, \n%s, \n%s"};
     for (int type = 0; type <= 3; ++type) {
-        const std::string format = list_format(100000, type), last = list_format(1, type);
+        const std::string format = list_format(100000, type);
         EXPECT_EQ(list_format(3, type), expected[type]);
         EXPECT_TRUE(format.size() < 4096U && format.size() > 4080U) << "cut to whole items within its room";
-        EXPECT_TRUE(format.ends_with(" " + last) || format.ends_with("\n" + last));
+        EXPECT_TRUE(format.ends_with(list_format(2, type)));
     }
-    for (const int bad : {-1, 4}) EXPECT_EQ(list_format(2, bad), "");
-    EXPECT_EQ(list_format(0, 0), "");
+    EXPECT_EQ(list_format(2, -1) + list_format(2, 4) + list_format(0, 0), "");
 }
 
 TEST(ScanList, ReadsWhatFitsAndLeavesTheRest) {
