@@ -188,6 +188,7 @@ TEST_F(HostileHeaderFile, CannotPromiseMoreValuesThanItHasRoomFor) {
             write_text(file_, replaced(text, "<width>2.25</width>", ""));
             incomplete.fill(before);
             EXPECT_FALSE(read(incomplete));
+            EXPECT_EQ(incomplete.element(0)->count, incomplete.pages ? 3 * incomplete.nBooks : 0);
             EXPECT_EQ(incomplete.clone(&copy), 0);  // the address sanitizer watches
             EXPECT_EQ(write(incomplete), incomplete.isBufferAllocated() ? 0 : 1);
         }
