@@ -12,7 +12,6 @@ constexpr quo::FieldTable kTable{
     "Shelf",
     QUO_FIELD(pages, "Pages", QUO_LENGTH(nBooks, 3)),
     QUO_FIELD(width, "ShelfWidth"),
-    QUO_FIELD(height, quo::bounds(0, 10)),
     QUO_FIELD(boards, quo::bounds(1, 1000), quo::kOptional),
     QUO_FIELD(label),
     QUO_FIELD(code, quo::kXmlOnly),
@@ -20,6 +19,7 @@ constexpr quo::FieldTable kTable{
     QUO_FIELD(shape, QUO_LENGTH(nBooks)),
     QUO_FIELD(nBooks, "Books"),
     QUO_FIELD(weights, QUO_LENGTH(nBooks), quo::kOptional),
+    QUO_FIELD(height, quo::bounds(0, 10)),  // a value behind the length
 };
 
 }  // namespace
