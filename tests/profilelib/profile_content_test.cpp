@@ -7,7 +7,6 @@
 #include <string_view>
 
 #include "profile_property.h"
-#include "profilelib/name_hash.h"
 #include "support/diagnostics.h"
 
 namespace {
@@ -84,18 +83,6 @@ TEST(ProfileContent, AnswersEveryKeyOfALargeFile) {
     for (int i = kKeys - 1; i >= 5; i -= 5) content.erase_section("s");
     EXPECT_EQ(content.find("s", "key5"), nullptr);
     EXPECT_NE(content.find("s", "key4"), nullptr);
-}
-
-// Names that are compared anyway may meet; numbered ones must not, or look-ups become walks. 64 in each bucket,
-// and ten standard deviations of 8: a good hash passes with any random numbers.
-TEST(NameHash, SpreadsNumberedNamesOverTheLowBits) {
-    std::set<std::uint64_t> hashes;
-    std::array<int, 64> buckets{};
-    for (int i = 0; i < 4096; ++i)
-        hashes.insert(quo::NameHash{}.add("Section").add("Parameter" + std::to_string(i)).value());
-    for (const std::uint64_t hash : hashes) ++buckets.at(hash % 64);
-    EXPECT_EQ(hashes.size(), 4096U);
-    EXPECT_LT(*std::max_element(buckets.begin(), buckets.end()), 144);
 }
 
 }  // namespace
