@@ -9,7 +9,9 @@ target_compile_options(quo_flags INTERFACE
     # Results must not hang on which operations the compiler chose to fuse.
     -ffp-contract=off)
 target_compile_definitions(quo_flags INTERFACE _FILE_OFFSET_BITS=64)
+set(quo_test_level -O1)
 if(QUO_SANITIZE)
+    set(quo_test_level -O0)
     # Frame pointers and line tables are enough for readable findings and keep the build small.
     set(quo_sanitize -fsanitize=address,undefined -fno-sanitize-recover=all -fno-omit-frame-pointer)
     target_compile_options(quo_flags INTERFACE ${quo_sanitize} -O1 -g1)
@@ -63,6 +65,8 @@ function(quo_test name)
     cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "SOURCES;COMPONENTS;LINK")
     set(target ${name}_test)
     add_executable(${target} ${arg_SOURCES})
+    # Optimising the tests themselves takes longer than running them as they are.
+    set_property(SOURCE ${arg_SOURCES} APPEND PROPERTY COMPILE_OPTIONS $<$<NOT:$<CONFIG:Debug>>:${quo_test_level}>)
     target_include_directories(${target} PRIVATE "${PROJECT_SOURCE_DIR}/tests")
     target_compile_definitions(${target} PRIVATE QUO_TEST_DATA="${PROJECT_SOURCE_DIR}/tests/data")
     quo_link_components(${target} ${arg_COMPONENTS})

@@ -30,12 +30,13 @@
  * bytes that are not are taken as Latin-1 when written, and control characters, which XML cannot hold, are
  * refused.
  *
- * Headers are read without network access, without entity substitution and without loading of DTDs; a document
- * that declares anything in a DTD of its own or nests deeper than 256 elements counts as no header. A text above
+ * Headers are read without network access, without entity substitution and without loading of DTDs. A text above
  * ten million bytes, names above ten million bytes in all, a file above 1 GiB and a real lack of memory give 7,
  * and the file is never replaced by a fresh document. Nor is one that is there but cannot be opened or read (no
- * rights, no free descriptor, a failing disk): a fresh document stands in for it in memory, and saving that
- * gives 1. File names hold at most 511 bytes; a longer one is refused, never cut.
+ * rights, no free descriptor, a failing disk), or that declares anything in a DTD of its own or nests deeper than
+ * 256 elements: reading gives 4, a fresh document stands in for it in memory, and saving that gives 1. A document
+ * in memory takes about the size of its file, eight times as much at most. File names hold at most 511 bytes; a
+ * longer one is refused, never cut.
  *
  * Operations return 0, 1 (refused: missing field, bad argument, file that cannot be read or saved) or 7 (out of
  * memory) unless said otherwise. One object serves one thread at a time. */
@@ -134,7 +135,8 @@ protected:
     /** The XPath expression of a channel, or of a field of it; for messages, not for evaluation. */
     static int setXpathExpression(int channel, std::string& expression);
     static int setXpathExpression(int channel, const char* field, std::string& expression);
-    /** The first element (the one at `index`, from 0) of a field, or null. The handle is libxml2's node. */
+    /** The first element (the one at `index`, from 0) of a field, or null. The handle can only be
+     * compared, and holds until the document changes. */
     void* getNode(int channel, const char* field) const;
     void* getNode(int channel, const char* field, int index) const;
     /** How many elements a field path leads to, and whether there are any, or that many; 0 and false without a

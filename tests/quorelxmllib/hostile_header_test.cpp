@@ -32,9 +32,29 @@ protected:
     [[nodiscard]] int write(Shelf& object) const { return object.writeAuxiliaryFile(file_.c_str(), 1, "Shelf"); }
 };
 
-// What every unreadable header must do: give nothing, then be replaced by a fresh header when written to.
+std::filesystem::directory_iterator files_of(const char* folder) {
+    return std::filesystem::directory_iterator{std::string{QUO_TEST_DATA} + "/headers/" + folder};
+}
+
+// XML that is not followed may hold a whole product. It used to pass for no header, and was replaced by one.
+TEST_F(HostileHeaderFile, IsNeverReplacedWhereItIsXml) {
+    for (const auto& data : files_of("refused")) {
+        SCOPED_TRACE(data.path());
+        const std::string refused = read_text(data.path());
+        write_text(file_, refused);
+        Shelf object, fresh;
+        EXPECT_EQ(quorelxml::readTexts(file_.c_str(), 1, "Shelf/width", [](std::string_view) {}), 4);
+        EXPECT_FALSE(read(object));
+        EXPECT_TRUE(object == fresh);
+        EXPECT_EQ(write(object), 1);
+        EXPECT_TRUE(read_text(file_) == refused);
+    }
+}
+
+// What everything else that is no header must do: give nothing, then be replaced by a fresh header when written
+// to.
 TEST_F(HostileHeaderFile, ReadsAsAFreshDocument) {
-    for (const auto& data : std::filesystem::directory_iterator{QUO_TEST_DATA "/headers/hostile"}) {
+    for (const auto& data : files_of("hostile")) {
         SCOPED_TRACE(data.path());
         const std::string hostile = read_text(data.path());
         write_text(file_, hostile);

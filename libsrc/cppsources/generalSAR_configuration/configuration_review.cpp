@@ -17,7 +17,8 @@ using Record = GeneralSAR_ConfigurationRecord;
 
 constexpr const char* kSource = "generalSAR_configuration";
 
-std::string_view name_of(const xmlNode* node) { return reinterpret_cast<const char*>(node->name); }
+using quo::HeaderTree;
+using quo::Node;
 
 std::string_view trimmed(std::string_view text) {
     constexpr std::string_view kBlanks = " \t\r\n";
@@ -29,11 +30,11 @@ std::string_view trimmed(std::string_view text) {
 /** Goes through the values of an array as they are read: `val` elements, or else one list. */
 class ArrayCheck {
 public:
-    ArrayCheck(const parElement& element, const xmlNode* node) : element_{element} {
-        for (xmlNode* child = node->children; child; child = child->next) {
-            if (quo::is_named(child, "val")) see(quo::NodeText{child});
+    ArrayCheck(const parElement& element, const HeaderTree& tree, Node node) : element_{element} {
+        for (Node child = tree.first(node); child != Node::none; child = tree.next(child)) {
+            if (tree.is_named(child, "val")) see(quo::NodeText{tree, child});
         }
-        if (count_ == 0) see_list(quo::NodeText{const_cast<xmlNode*>(node)});
+        if (count_ == 0) see_list(quo::NodeText{tree, node});
     }
     [[nodiscard]] std::string reason() const {
         const std::string wrong = element_.countDefect(count_);
@@ -70,9 +71,9 @@ public:
     }
 
     /** Whether the section is the record and not the shared parameters alone. */
-    bool run(const xmlNode* section) {
-        for (const xmlNode* child = section->children; child; child = child->next) {
-            if (child->type == XML_ELEMENT_NODE) see(child);
+    bool run(const HeaderTree& tree, Node section) {
+        for (Node child = tree.first(section); child != Node::none; child = tree.next(child)) {
+            if (tree.is_element(child)) see(tree, child);
         }
         const bool is_record = seen_own_ || elements_.size() == own_;
         if (!is_record) return false;
@@ -92,16 +93,16 @@ private:
     void find(std::string_view name, std::string reason) {
         findings_.push_back({record_.section(), std::string{name}, std::move(reason)});
     }
-    void see(const xmlNode* node) {
-        const auto found = elements_.find(name_of(node));
-        if (found == elements_.end() || node->ns) return find(name_of(node), "is unknown");
+    void see(const HeaderTree& tree, Node node) {
+        const std::string_view name = tree.local_name(node);
+        const auto found = elements_.find(name);
+        if (found == elements_.end() || tree.in_namespace(node)) return find(name, "is unknown");
         Expected& expected = found->second;
         seen_own_ = seen_own_ || expected.own;
-        if (std::exchange(expected.seen, true)) return find(name_of(node), "stands there more than once");
-        std::string reason = expected.element.count > 1
-                                 ? ArrayCheck{expected.element, node}.reason()
-                                 : expected.element.defect(quo::NodeText{const_cast<xmlNode*>(node)});
-        if (!reason.empty()) find(name_of(node), std::move(reason));
+        if (std::exchange(expected.seen, true)) return find(name, "stands there more than once");
+        std::string reason = expected.element.count > 1 ? ArrayCheck{expected.element, tree, node}.reason()
+                                                        : expected.element.defect(quo::NodeText{tree, node});
+        if (!reason.empty()) find(name, std::move(reason));
     }
 
     Record& record_;
@@ -111,15 +112,15 @@ private:
     bool seen_own_ = false;
 };
 
-void review_section(const xmlNode* section, std::map<std::string, bool, std::less<>>& seen,
+void review_section(const HeaderTree& tree, Node section, std::map<std::string, bool, std::less<>>& seen,
                     ConfigurationReview& review) {
-    const std::string name{name_of(section)};
-    const auto record = section->ns ? nullptr : Record::make(name);
+    const std::string name{tree.local_name(section)};
+    const auto record = tree.in_namespace(section) ? nullptr : Record::make(name);
     if (!record) {
         review.findings.push_back({name, "", "is no configuration record"});
     } else if (std::exchange(seen[name], true)) {
         review.findings.push_back({name, "", "stands there more than once"});
-    } else if (SectionReview{*record, review.findings}.run(section)) {
+    } else if (SectionReview{*record, review.findings}.run(tree, section)) {
         review.records.push_back(name);
     }
 }
@@ -129,9 +130,10 @@ int review_file(const char* file, int channel, ConfigurationReview& review) {
     if (const int status = quo::HeaderDocument::load(file, document)) return status;
     if (!document->is_header()) return QUO_REFUSED;
     std::map<std::string, bool, std::less<>> seen;
-    document->visit(channel, "", [&](const xmlNode* node) {
-        for (const xmlNode* section = node->children; section; section = section->next) {
-            if (section->type == XML_ELEMENT_NODE) review_section(section, seen, review);
+    const HeaderTree& tree = document->tree();
+    document->visit(channel, "", [&](Node node) {
+        for (Node section = tree.first(node); section != Node::none; section = tree.next(section)) {
+            if (tree.is_element(section)) review_section(tree, section, seen, review);
         }
         return true;
     });

@@ -39,9 +39,12 @@ HeaderSession::~HeaderSession() { innermost = outer_; }
 
 int fail_unread(CallFrame& frame, int status, const char* file) noexcept {
     static_assert(quorelxml::kMostFileBytes == 1LL << 30);
-    const char* reason = status == QUO_READ_FAILED ? "cannot be read"
-                         : errno == EFBIG          ? "is larger than 1 GiB"
-                                                   : "does not fit into memory";
+    const bool refused = errno == ENOTSUP;
+    const char* reason = refused ? "declares entities or elements, or nests deeper than 256 elements"
+                         : status == QUO_READ_FAILED ? "cannot be read"
+                         : errno == EFBIG            ? "is larger than 1 GiB"
+                                                     : "does not fit into memory";
+    if (refused) CallFrame::drop_errno();
     frame.check_errno();
     char message[1024];
     format_bounded(message, sizeof message, "Header file %s %s", file, reason);

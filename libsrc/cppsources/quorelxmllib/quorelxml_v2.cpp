@@ -21,6 +21,8 @@
 using quo::CallFrame;
 using quo::guarded;
 using quo::HeaderDocument;
+using quo::HeaderTree;
+using quo::Node;
 
 namespace {
 
@@ -32,10 +34,6 @@ constexpr std::size_t kDescriptionRoom = 2048;
 constexpr int kPrecision = 15;
 
 std::atomic<bool> exact_numbers = false;
-
-int out_of_memory(quo::CallerFrame frame) noexcept {
-    return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
-}
 
 void print_missing(const char* what) noexcept {
     std::fprintf(stderr, "File not recognized: %s does not exist\n", what);
@@ -55,26 +53,27 @@ void convert(const char* text, float& value) noexcept { value = static_cast<floa
 
 /** Reads up to `count` values from the `val` children of an element; returns how many it had. */
 template <typename T>
-int read_children(const xmlNode* node, T* values, int count) {
+int read_children(const HeaderTree& tree, Node node, T* values, int count) {
     int read = 0;
-    for (const xmlNode* child = node->children; child && read < count; child = child->next)
-        if (quo::is_named(child, "val")) convert(quo::NodeText{child}.c_str(), values[read++]);
+    for (Node child = tree.first(node); child != Node::none && read < count; child = tree.next(child))
+        if (tree.is_named(child, "val")) convert(quo::NodeText{tree, child}.c_str(), values[read++]);
     return read;
 }
 
 /** Reads a numeric field; false when no element bears its name. */
 template <typename T>
 bool read_numbers(const HeaderDocument& document, int channel, std::string_view field, T* values, int count) {
-    xmlNode* first = nullptr;
+    Node first = Node::none;
     int read = 0;
-    document.visit(channel, field, [&](xmlNode* node) {
-        if (!first) first = node;
-        if (count > 1) read += read_children(node, values + read, count - read);
+    document.visit(channel, field, [&](Node node) {
+        if (first == Node::none) first = node;
+        if (count > 1) read += read_children(document.tree(), node, values + read, count - read);
         return count > 1 && read < count;
     });
-    if (first && count == 1) convert(quo::NodeText{first}.c_str(), *values);
-    if (first && count > 1 && read == 0) quo::scan_list(quo::NodeText{first}.c_str(), values, count);
-    return first != nullptr;
+    if (first == Node::none) return false;
+    if (count == 1) convert(document.text(first).c_str(), *values);
+    if (count > 1 && read == 0) quo::scan_list(document.text(first).c_str(), values, count);
+    return true;
 }
 
 }  // namespace
@@ -87,14 +86,15 @@ struct quorelxml::Mirror {
     static int refresh(quorelxml& self) noexcept {
         if (!self.document_) return QUO_REFUSED;
         CallFrame frame{"quorelxml::isRecognized", kSource};
-        const xmlNode* number = self.document_->find(kNumberOfChannels);
-        const xmlNode* description = self.document_->find(kDescription);
-        if (self.debug_ && !number) print_missing("/QuorelXmlDoc/NumberOfChannels");
-        if (self.debug_ && !description) print_missing("/QuorelXmlDoc/Description");
+        const HeaderDocument& document = *self.document_;
+        const Node number = document.find(kNumberOfChannels), description = document.find(kDescription);
+        const bool has_number = number != Node::none, has_description = description != Node::none;
+        if (self.debug_ && !has_number) print_missing("/QuorelXmlDoc/NumberOfChannels");
+        if (self.debug_ && !has_description) print_missing("/QuorelXmlDoc/Description");
         return guarded(frame, [&] {
-            if (number) self.number_of_channels_ = quo::scan_int32(quo::NodeText{number}).value;
-            if (description) self.mirrorDescription(quo::NodeText{description});
-            return number && description ? frame.success() : frame.silent(QUO_REFUSED);
+            if (has_number) self.number_of_channels_ = quo::scan_int32(document.text(number)).value;
+            if (has_description) self.mirrorDescription(document.text(description));
+            return has_number && has_description ? frame.success() : frame.silent(QUO_REFUSED);
         });
     }
     /** The same, with a fresh document in the place of another one. 0 or 7. */
@@ -170,10 +170,9 @@ int quorelxml::createDocument() noexcept {
     return guarded(frame, [&] {
         if (irreplaceable_) return frame.fail(QUO_NO_MEMORY, "Header file does not fit into memory");
         document_ = HeaderDocument::create(unreadable_);
-        if (!document_) return out_of_memory(frame);
         CallFrame::drop_errno();
         number_of_channels_ = 0;
-        mirrorDescription(quo::NodeText{document_->find(kDescription)});
+        mirrorDescription(document_->text(document_->find(kDescription)));
         return frame.success();
     });
 }
@@ -209,7 +208,7 @@ int quorelxml::setDescription(const char* file_name, const char* text) noexcept 
     const int status = guarded(frame, [&] {
         const auto content = quo::xml_text(quo::text_or_empty(text));
         if (!content) return frame.fail(QUO_REFUSED, "Text cannot be stored in XML");
-        if (!document_->set_text(document_->find(kDescription), *content)) return out_of_memory(frame);
+        document_->set_text(document_->find(kDescription), *content);
         mirrorDescription(*content);
         const int written = write();
         return written ? frame.callee(written) : frame.success();
@@ -233,7 +232,10 @@ int quorelxmlPi::initXmlFile(const char* file_name, const char* stylesheet) noex
 int quorelxml::insertInstruction(const char* name, const char* content) noexcept {
     CallFrame frame{"quorelxml::insertInstruction", kSource};
     if (!document_) return frame.fail(QUO_REFUSED, "No header document");
-    return document_->insert_instruction(name, content) ? frame.success() : out_of_memory(frame);
+    return guarded(frame, [&] {
+        document_->insert_instruction(name, content);
+        return frame.success();
+    });
 }
 
 std::string quorelxml::xmlDefect(const char* file_name) {
@@ -270,22 +272,22 @@ void quorelxml::printMissing(int channel, const char* field) const {
 void* quorelxml::getNode(int channel, const char* field) const { return getNode(channel, field, 0); }
 
 void* quorelxml::getNode(int channel, const char* field, int index) const {
-    xmlNode* found = nullptr;
+    Node found = Node::none;
     bool any = false;
     if (document_ && index >= 0)
-        document_->visit(channel, quo::text_or_empty(field), [&](xmlNode* node) {
+        document_->visit(channel, quo::text_or_empty(field), [&](Node node) {
             any = true;
             if (index-- == 0) found = node;
-            return !found;
+            return found == Node::none;
         });
     if (!any) printMissing(channel, field);
-    return found;
+    return found == Node::none ? nullptr : const_cast<void*>(document_->tree().address(found));
 }
 
 int quorelxml::countNodes(int channel, const char* field) const {
     int count = 0;
     if (document_)
-        document_->visit(channel, quo::text_or_empty(field), [&](xmlNode*) {
+        document_->visit(channel, quo::text_or_empty(field), [&](Node) {
             ++count;
             return count < std::numeric_limits<int>::max();
         });
@@ -295,7 +297,7 @@ int quorelxml::countNodes(int channel, const char* field) const {
 bool quorelxml::channelExists(int channel) const { return document_ && getNode(channel, ""); }
 
 bool quorelxml::fieldExists(int channel, const char* field) const {
-    return document_ && document_->first(channel, quo::text_or_empty(field));
+    return document_ && document_->first(channel, quo::text_or_empty(field)) != Node::none;
 }
 
 bool quorelxml::fieldHasCount(int channel, const char* field, int count) const {
@@ -308,12 +310,11 @@ int quorelxml::createChannel(int channel) noexcept {
     CallFrame frame{"quorelxml::createChannel", kSource};
     return guarded(frame, [&] {
         if (const int status = Mirror::refresh_or_create(*this)) return frame.callee(status);
-        if (document_->first(channel, "")) return frame.success();
+        if (document_->first(channel, "") != Node::none) return frame.success();
         // A file's count is not to be trusted to leave room for one more.
         if (number_of_channels_ < std::numeric_limits<std::int32_t>::max()) ++number_of_channels_;
-        if (!document_->append_channel(channel) ||
-            !document_->set_text(document_->find(kNumberOfChannels), quo::format_int(number_of_channels_)))
-            return out_of_memory(frame);
+        document_->append_channel(channel);
+        document_->set_text(document_->find(kNumberOfChannels), quo::format_int(number_of_channels_));
         return frame.success();
     });
 }
@@ -324,7 +325,8 @@ int quorelxml::createField(int channel, const char* field) noexcept {
         const std::string_view path = quo::text_or_empty(field);
         if (!path.empty() && !quo::is_field_path(path)) return frame.fail(QUO_REFUSED, "Bad field name");
         if (const int status = createChannel(channel)) return frame.callee(status);
-        return document_->ensure(channel, path) ? frame.success() : out_of_memory(frame);
+        (void)document_->ensure(channel, path);
+        return frame.success();
     });
 }
 
@@ -336,9 +338,9 @@ int quorelxml::createField(int channel, const char* field, int count) noexcept {
         const std::string_view path = quo::text_or_empty(field);
         const auto slash = path.rfind('/');
         const bool top = slash == std::string_view::npos;
-        xmlNode* parent = document_->first(channel, top ? std::string_view{} : path.substr(0, slash));
+        const Node parent = document_->first(channel, top ? std::string_view{} : path.substr(0, slash));
         for (int present = countNodes(channel, field); present < count; ++present)
-            if (!document_->append(parent, top ? path : path.substr(slash + 1))) return out_of_memory(frame);
+            document_->append(parent, top ? path : path.substr(slash + 1));
         return frame.success();
     });
 }
@@ -346,10 +348,8 @@ int quorelxml::createField(int channel, const char* field, int count) noexcept {
 int quorelxml::clearField(int channel, const char* field) noexcept {
     CallFrame frame{"quorelxml::clearField", kSource};
     return guarded(frame, [&] {
-        if (!document_) return frame.success();
-        // The elements of one path never lie inside one another, so all can be found before the first goes.
-        constexpr auto kAll = std::numeric_limits<std::size_t>::max();
-        for (xmlNode* node : document_->all(channel, quo::text_or_empty(field), kAll)) document_->remove(node);
+        if (document_) document_->remove_all(channel, quo::text_or_empty(field));
+        if (document_) document_->tidy();
         return frame.success();
     });
 }
@@ -393,25 +393,21 @@ struct quorelxml::Values {
         if (count < 1) return frame.success();
         if (!quo::is_field_path(path)) return frame.fail(QUO_REFUSED, "Bad field name");
         const auto wanted = static_cast<std::size_t>(count);
-        std::vector<xmlNode*> nodes;
+        if (self.document_) self.document_->tidy();
+        std::vector<Node> nodes;
         if (self.document_) nodes = self.document_->all(channel, path, wanted);
         if (nodes.size() < wanted) {
             if (const int status = self.createField(channel, path, count)) return frame.callee(status);
             nodes = self.document_->all(channel, path, wanted);
         }
-        for (std::size_t i = 0; i < wanted; ++i)
-            if (!set(*self.document_, nodes[i], text_of(i), count > 1 ? i + 1 : 0)) return out_of_memory(frame);
+        for (std::size_t i = 0; i < wanted; ++i) {
+            self.document_->set_text(nodes[i], text_of(i));
+            if (count > 1) self.document_->set_number(nodes[i], "N", static_cast<std::int64_t>(i) + 1);
+        }
         self.document_->count_written(count);
         CallFrame::drop_errno();
         return frame.success();
     }
-    /** Sets a value's text and, where it is not 0, its number. */
-    static bool set(HeaderDocument& document, xmlNode* node, std::string_view text, std::size_t number) {
-        if (!document.set_text(node, text)) return false;
-        return number == 0 ||
-               quo::set_attribute(node, "N", quo::format_int(static_cast<std::int64_t>(number)).data);
-    }
-
     template <typename T, typename Format>
     static int write_numbers(quorelxml& self, const quo::SharedCall& function, int channel, const char* field,
                              const T* values, int count, Format format) noexcept {
@@ -452,11 +448,11 @@ int quorelxml::readString(int channel, const char* field, char* const* values, i
     if (!field || (!values && count > 0)) return frame.fail(QUO_REFUSED, "Null argument");
     return guarded(frame, [&] {
         const auto wanted = static_cast<std::size_t>(std::max(count, 0));
-        std::vector<xmlNode*> nodes;
+        std::vector<Node> nodes;
         if (document_) nodes = document_->all(channel, field, wanted);
         if (!document_ || nodes.size() < wanted)
             return frame.silent(Values::missing(*this, {kFunction, "string", channel, field}));
-        for (std::size_t i = 0; i < wanted; ++i) quo::copy_bounded(values[i], room, quo::NodeText{nodes[i]});
+        for (std::size_t i = 0; i < wanted; ++i) quo::copy_bounded(values[i], room, document_->text(nodes[i]));
         return frame.success();
     });
 }
@@ -467,8 +463,8 @@ int quorelxml::readTexts(int channel, const char* field,
     if (!field) return frame.fail(QUO_REFUSED, "Null argument");
     return guarded(frame, [&] {
         if (document_)
-            document_->visit(channel, field, [&](const xmlNode* node) {
-                see(quo::NodeText{node});
+            document_->visit(channel, field, [&](Node node) {
+                see(document_->text(node));
                 return true;
             });
         return frame.success();
