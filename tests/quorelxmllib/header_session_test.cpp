@@ -129,6 +129,11 @@ TEST_F(HeaderSessionTest, SavesWholeObjectsOnly) {
     EXPECT_EQ(write(other, "Shelf"), 7);
     EXPECT_EQ(stand_in.commit(), 7);
     EXPECT_TRUE(read_text(other) == huge);
+    // A file that could not be read may have every section.
+    const std::string folder = folder_.path().string();
+    HeaderSession unread{folder.c_str()};
+    EXPECT_FALSE(read(folder, "Shelf"));
+    EXPECT_EQ(unread.failures(), 1);
 }
 
 }  // namespace
