@@ -54,9 +54,8 @@ QUO_BASE_API const char* GetSetProfileChar(int write, const char* section, const
  * With null, all files are written, in the order of loading.
  *
  * @return With a path: 0 when written or when no such file is in memory; 1 when it cannot be opened for writing,
- * is a folder or pipe, or could not be read; -1 when writing failed. With null, deliberately inverted and of
- * the file loaded last alone: -1 when it was written (or there is none), 0 when it could not be opened or written.
- */
+ * is a folder or pipe, or could not be read; -1 when writing failed. With null, inverted and of the file loaded
+ * last alone: -1 when it was written (or there is none), 0 when it could not be opened or written. */
 QUO_BASE_API int SyncProfile(const char* file) QUO_NOEXCEPT;
 
 /** Forgets a file without writing it (all files when null). Its next use reads it again from the disk. */

@@ -2,7 +2,6 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <libxml/xmlmemory.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -20,41 +19,19 @@
 #include "quo_base/ckerr.h"
 #include "quo_base/datafile.h"
 #include "support/diagnostics.h"
-#include "support/failing_new.h"
+#include "support/failing_memory.h"
 
 // Every system call of every job that saves or reads fails in turn, in each way that it can, once and from then
 // on; so does every allocation; and the process is killed before each call. One rule holds for all: a file is what
 // it was or what it was to become, and success means the latter.
 
-// NOLINTBEGIN(bugprone-reserved-identifier): the linker's names. It sends the allocations of the library and of
-// this program here; those of libxml2 and of the operators new come along.
-extern "C" {
-void* __real_malloc(std::size_t size);
-void* __real_calloc(std::size_t count, std::size_t size);
-void* __real_realloc(void* block, std::size_t size);
-void* __wrap_malloc(std::size_t size) { return test::is_refused() ? nullptr : __real_malloc(size); }
-void* __wrap_calloc(std::size_t count, std::size_t size) {
-    return test::is_refused() ? nullptr : __real_calloc(count, size);
-}
-void* __wrap_realloc(void* block, std::size_t size) {
-    return test::is_refused() ? nullptr : __real_realloc(block, size);
-}
-}
-// NOLINTEND(bugprone-reserved-identifier)
-
 namespace {
+
+constexpr uid_t kOrdinaryUser = 65534;
 
 using test::Call;
 using test::Job;
 using test::Promise;
-
-void* xml_malloc(std::size_t size) { return std::malloc(size); }
-void* xml_realloc(void* block, std::size_t size) { return std::realloc(block, size); }
-char* xml_strdup(const char* text) {
-    const std::size_t size = std::strlen(text) + 1;
-    void* const copy = std::malloc(size);
-    return copy ? static_cast<char*>(std::memcpy(copy, text, size)) : nullptr;
-}
 
 /** A system call and what it can say. */
 struct Failing {
@@ -82,14 +59,16 @@ const std::vector<Failing> kFailing = {
     {"kill", Call::kAny, {test::kKill}},
 };
 
-/** Permissions and bytes of the files of a folder, by name. */
+/** Permissions and bytes of the files of a folder, by name; of what is no file, that it is there. */
 using State = std::map<std::string, std::string>;
 State state_of(const std::string& folder) {
     State state;
-    for (const auto& entry : std::filesystem::directory_iterator{folder})
-        state[entry.path().filename().string()] =
-            std::to_string(static_cast<unsigned>(entry.status().permissions())) + ' ' +
-            test::read_text(entry.path());
+    if (!std::filesystem::exists(folder)) return state;
+    for (const auto& entry : std::filesystem::directory_iterator{folder}) {
+        const auto mode = std::to_string(static_cast<unsigned>(entry.status().permissions())) + ' ';
+        const bool is_file = entry.is_regular_file() && !entry.is_symlink();
+        state[entry.path().filename().string()] = is_file ? mode + test::read_text(entry.path()) : "no file";
+    }
     return state;
 }
 void restore(const std::string& folder, const State& state) {
@@ -110,8 +89,32 @@ bool holds(const State& state, const State::value_type& file) {
 struct Outcome {
     int status = 0, signal = 0;
     long descriptors = 0;
-    bool reached = false;
+    bool reached = false, blocks = false;
     std::string output, said;  // of the tool, where it succeeds and where it fails
+};
+
+/** What stands where a file is to be written, and whether that can be done all the same. Whoever runs the job has
+ * no rights beyond those of the files. */
+struct Obstacle {
+    const char* name;
+    void (*lay)(const std::string& folder, const std::string& file);
+    bool passable = false;
+};
+const Obstacle kObstacles[] = {
+    {"a folder",
+     [](auto&, auto& file) {
+         std::filesystem::remove(file);
+         std::filesystem::create_directory(file);
+     }},
+    {"a full device",
+     [](auto&, auto& file) {
+         std::filesystem::remove(file);
+         std::filesystem::create_symlink("/dev/full", file);
+     }},
+    {"no folder", [](auto& folder, auto&) { std::filesystem::remove_all(folder); }},
+    {"a file that may not be written", [](auto&, auto& file) { chmod(file.c_str(), 0444); }},
+    // It is written where it stands, with a warning.
+    {"a folder that may not be written", [](auto& folder, auto&) { chmod(folder.c_str(), 0555); }, true},
 };
 
 /** Runs one job again and again, each time in a process of its own and on the same files. */
@@ -148,6 +151,8 @@ public:
     /** Which rule an outcome breaks; empty where none. */
     [[nodiscard]] std::string breach(const test::Fault& fault, const Outcome& outcome) const;
     std::string breach_after_kill();
+    /** The same where something is in the way of each file that the job is to change. */
+    std::string breach_at(const Obstacle& obstacle);
 
 private:
     [[noreturn]] void be_library(const test::Fault& fault, bool endlessly);
@@ -161,6 +166,7 @@ private:
     Outcome whole_;
     const int shared_;
     test::Watch* watch_ = nullptr;
+    bool ordinary_user_ = false;
 };
 
 pid_t Bench::start(const test::Fault& fault, bool endlessly) {
@@ -178,21 +184,26 @@ pid_t Bench::start(const test::Fault& fault, bool endlessly) {
 
 void Bench::be_library(const test::Fault& fault, bool endlessly) {
     init_report(beside_.file("report").c_str(), "faults", 1);
+    if (ordinary_user_ && getuid() == 0 && setuid(kOrdinaryUser) != 0) _exit(99);
     test::start_watching(watch_);
     int status = 0;
     do {
         const bool refuses = fault.call == Call::kMemory;
-        if (refuses) test::fail_news(fault.nth - 1, test::News::kNone, !fault.forever);
+        if (refuses) test::refuse_memory(fault.nth - 1, !fault.forever);
         watch_->reached = refuses;  // should the refusal end the process
         try {
             status = run_();
         } catch (const std::bad_alloc&) {
             status = QUO_NO_MEMORY;  // jobs that must not let it out are noexcept
         }
-        if (refuses) watch_->reached = test::stop_failing();
+        if (refuses) watch_->reached = test::stop_refusing();
     } while (endlessly);
     run_ = nullptr;  // files that the job's objects hold open are closed with them
     watch_->returned = true;
+    const long said = lseek(STDERR_FILENO, 0, SEEK_CUR);
+    exit_report();
+    exit_ckerr();  // which lists the tracked blocks that are left
+    watch_->blocks = lseek(STDERR_FILENO, 0, SEEK_CUR) != said;
     _exit(status != 0 ? 1 : 0);
 }
 
@@ -218,6 +229,7 @@ Outcome Bench::wait(pid_t child) const {
     Outcome outcome;
     outcome.descriptors = watch_->returned ? watch_->descriptors : 0;
     outcome.reached = watch_->reached;
+    outcome.blocks = watch_->blocks;
     if (WIFEXITED(ended)) outcome.status = WEXITSTATUS(ended);
     if (WIFSIGNALED(ended)) outcome.signal = WTERMSIG(ended);
     if (job_.promise == Promise::kReports &&
@@ -231,6 +243,7 @@ Outcome Bench::wait(pid_t child) const {
 std::string Bench::breach(const test::Fault& fault, const Outcome& outcome) const {
     const State now = state_of(folder_);
     if (outcome.signal != 0) return "signal " + std::to_string(outcome.signal) + ' ' + outcome.said;
+    if (outcome.blocks) return "leaves memory";
     if (job_.promise == Promise::kSurvives) return "";
     const bool claims = outcome.status == 0 && job_.promise != Promise::kSilent;
     if (claims && (now != fresh_ || outcome.output != whole_.output)) return "0 but not new";
@@ -272,6 +285,34 @@ std::string Bench::breach_after_kill() {
     return "";
 }
 
+std::string Bench::breach_at(const Obstacle& obstacle) {
+    std::filesystem::permissions(beside_.path(), std::filesystem::perms{0755});
+    chmod(folder_.c_str(), 0777);
+    for (const auto& [name, content] : old_)
+        if (chown((folder_ + '/' + name).c_str(), kOrdinaryUser, kOrdinaryUser) != 0) errno = 0;
+    for (const auto& file : fresh_)
+        if (!holds(old_, file)) obstacle.lay(folder_, folder_ + '/' + file.first);
+    const State before = state_of(folder_);
+    if (before == old_ && !obstacle.passable) return "";  // what is new has no rights that could be missing
+    ordinary_user_ = true;
+    const Outcome outcome = run();
+    ordinary_user_ = false;
+    const State now = state_of(folder_);
+    const std::string report = test::read_text(beside_.file("report"));
+    restore(folder_, old_);
+    if (outcome.signal != 0) return "signal " + std::to_string(outcome.signal);
+    const bool overwrites =
+        std::ranges::all_of(fresh_, [&](const auto& file) { return old_.contains(file.first); });
+    if (obstacle.passable && overwrites) {
+        if (outcome.status != 0 || now != fresh_) return "not written in place";
+        const bool tells = (job_.promise == Promise::kOldOrNew || job_.promise == Promise::kReports) &&
+                           !job_.name.starts_with("BufferFile");
+        return tells && report.find("WARNING") == report.npos ? "no warning" : "";
+    }
+    if (outcome.status == 0 && job_.promise != Promise::kSilent) return "0 but not new";
+    return now == before || job_.promise == Promise::kTells ? "" : "not as before";
+}
+
 std::vector<std::string> breaches(Bench& bench, const Failing& failing, int error, bool forever) {
     std::vector<std::string> found;
     bool reached = true;
@@ -287,10 +328,7 @@ std::vector<std::string> breaches(Bench& bench, const Failing& failing, int erro
     return found;
 }
 
-class Faults : public testing::TestWithParam<Job> {
-protected:
-    Faults() { xmlMemSetup(std::free, xml_malloc, xml_realloc, xml_strdup); }
-};
+class Faults : public testing::TestWithParam<Job> {};
 
 TEST_P(Faults, LeaveOldOrNewAndSuccessMeansNew) {
     Bench bench{GetParam()};
@@ -304,6 +342,12 @@ TEST_P(Faults, LeaveOldOrNewAndSuccessMeansNew) {
                 EXPECT_THAT(breaches(bench, failing, error, forever), testing::IsEmpty());
             }
     }
+}
+TEST_P(Faults, LeaveAloneWhatCannotBeReplaced) {
+    Bench bench{GetParam()};
+    const Job& job = GetParam();
+    if (job.verb || job.promise == Promise::kUnchanged || job.promise == Promise::kSurvives) return;
+    for (const Obstacle& obstacle : kObstacles) EXPECT_EQ(bench.breach_at(obstacle), "") << obstacle.name;
 }
 INSTANTIATE_TEST_SUITE_P(Jobs, Faults, testing::ValuesIn(test::jobs()),
                          [](const auto& row) { return row.param.name; });

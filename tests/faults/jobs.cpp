@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cmath>
 #include <cstdlib>
 #include <filesystem>
 #include <memory>
@@ -9,10 +10,12 @@
 
 #include "container/products.h"
 #include "quo_base/Coregist.h"
+#include "quo_base/MatrixAlgebraANSI.h"
 #include "quo_base/ckerr.h"
 #include "quo_base/debugIO.h"
 #include "quo_base/gen_utils.h"
 #include "quo_base/generalSAR_configuration.h"
+#include "quo_base/interp.h"
 #include "quo_base/profile.h"
 #include "quo_base/quorelReport.h"
 #include "quo_base/quorelxml_v2.h"
@@ -210,6 +213,47 @@ Run read_region(Folder folder) {
     };
 }
 
+template <int kBuffer>
+Run write_stream(Folder folder) {
+    auto made = raster<BufferFile>(folder, "out.raw");
+    return [=, bytes = test::raster_bytes(*made)] {
+        made->open(BufferFile::WRITE);
+        made->initbuffer(kBuffer, 0);
+        for (std::size_t done = 0; made->status() == 0 && done < bytes.size(); done += 20)
+            made->write(bytes.data() + done, 20);
+        made->close();
+        return made->status();
+    };
+}
+
+/** No file is touched here: what is computed is right, or the status says that memory was short. */
+Run compute(Folder folder) {
+    struct Given {
+        GeneralSAROrbit orbit;
+        ROI_Obj roi;
+        polyDC doppler;
+    };
+    auto given = std::make_shared<Given>();
+    test::load_orbit(test::kScenes[0], given->orbit);
+    given->roi.read_roi(file_in(folder, "scene.xml"), "ROI");
+    given->doppler.trg0 = given->roi.FastStartTime;
+    given->doppler.taz0 = given->roi.SlowStartTime;
+    return [given] {
+        const double matrix[] = {2.0, 1.0, 1.0, 3.0}, x[] = {1.0, 2.0, 3.0, 5.0}, y[] = {3.0, 5.0, 7.0, 11.0};
+        const std::array<fcomplex, 15> image{};
+        std::array<fcomplex, 4> at{fcomplex{17.3F}};
+        double inverse[4]{}, line[2]{};
+        polyFR rate;
+        int status = MatInv(matrix, inverse, 2);
+        if (status == 0) status = polfit(x, y, 4, line, 1);
+        if (status == 0) status = interp2D{}.interp2(image.data(), 5, 3, x, x, 2, at.data());
+        if (status == 0) status = demodulationPhase{0.5}.applyDemodPhase(at.data(), 2, 2);
+        if (status == 0) status = given->orbit.SVGetFRpoly(&given->roi, &given->doppler, &rate);
+        return judged(status, std::abs(inverse[0] - 0.6) + std::abs(line[1] - 2.0) < 1e-9 && at[0] == fcomplex{} &&
+                                  rate.pol[0] < 0.0);
+    };
+}
+
 Run write_chirp(Folder folder) {
     auto pulse = std::make_shared<SARPulse_Obj>();
     pulse->PulseLength = 1e-6;
@@ -275,6 +319,8 @@ const std::vector<test::Job>& test::jobs() {
         {"BufferFileCopy", kOldOrNew, copy_raster<BufferFile, kOldRaster>},
         {"Raster", kTells, write_raster<1, 0>},
         {"BufferedRaster", kTells, write_raster<2, 48>},
+        {"StreamedRaster", kTells, write_stream<0>},
+        {"BufferedStream", kTells, write_stream<48>},
         {"Chirp", kTells, write_chirp},
         {"Dump", kTells, dump},
         {"Report", kSurvives, report},
@@ -284,6 +330,7 @@ const std::vector<test::Job>& test::jobs() {
         {"ReadProfile", kUnchanged, with_profile<read_keys>},
         {"FallBack", kUnchanged, fall_back},
         {"ReadRegion", kUnchanged, read_region},
+        {"Compute", kUnchanged, compute},
 #ifdef QUO_TOOL
         {"set", kOldOrNew, nullptr, "set @/product.hdr SamplingConstants/prf_hz 17.3"},
         {"derive", kOldOrNew, nullptr, "derive @/scene.xml --what fr --replace"},

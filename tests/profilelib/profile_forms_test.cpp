@@ -3,6 +3,7 @@
 
 #include <array>
 #include <cstdint>
+#include <functional>
 #include <string>
 
 #include "quo_base/profile.h"
@@ -15,81 +16,107 @@ using testing::ElementsAre;
 constexpr const char* kFile = "/nowhere/a.par";  // exists in memory only
 constexpr const char* kKey = "Length";
 
-int ints[2] = {17, 29};
-int64_t wide[2] = {17, 29};
-float floats[2] = {17.5F, 29.5F};
-double doubles[2] = {17.5, 29.5};
-char text[8] = "";
+struct Data {
+    int ints[2] = {17, 29};
+    int64_t wide[2] = {17, 29};
+    float floats[2] = {17.5F, 29.5F};
+    double doubles[2] = {17.5, 29.5};
+    char text[8] = "";
+    bool operator==(const Data& other) const = default;
+};
+Data data;
+auto& [ints, wide, floats, doubles, text] = data;
 char* const strings[2] = {text, text};
 
-/** A wrapper's call, with a key that the store refuses when writing and does not have when reading. */
-struct Wrapper {
-    const char* name;
-    void (*call)(const char* key);
-    const char* message;
-};
-const Wrapper kWrappers[] = {
-    {"GetString", [](const char* key) { GetCheckMyProfileString("s", key, text, 8, kFile); },
-     "Error in GetMyProfileString: section s, key Length, file /nowhere/a.par\n"},
-    {"GetStringArray", [](const char* key) { GetCheckMyProfileStringArray("s", key, strings, 2, 8, kFile); },
-     "Error in GetMyProfileStringArray: section s, key Length, file /nowhere/a.par\n"},
-    {"GetIntArray", [](const char* key) { GetCheckMyProfileIntArray("s", key, ints, 2, kFile); },
-     "Error in GetMyProfileIntArray: section s, key Length, file /nowhere/a.par\n"},
-    {"GetInt64Array", [](const char* key) { GetCheckMyProfileInt64Array("s", key, wide, 2, kFile); },
-     "Error in GetMyProfileInt64Array: section s, key Length, file /nowhere/a.par\n"},
-    {"GetLongArray", [](const char* key) { GetCheckMyProfileLongArray("s", key, ints, 2, kFile); },
-     "Error in GetMyProfileIntArray: section s, key Length, file /nowhere/a.par\n"},
-    {"GetFloatArray", [](const char* key) { GetCheckMyProfileFloatArray("s", key, floats, 2, kFile); },
-     "Error in GetMyProfileFloatArray: section s, key Length, file /nowhere/a.par\n"},
-    {"GetDoubleArray", [](const char* key) { GetCheckMyProfileDoubleArray("s", key, doubles, 2, kFile); },
-     "Error in WriteMyProfileDouble: section s, key Length, file /nowhere/a.par\n"},
-    {"String", [](const char* key) { WriteCheckMyProfileString("s", key, "17.3", kFile); },
-     "Error in WriteMyProfileString: section s, key , string 17.3, file /nowhere/a.par\n"},
-    {"IntArray", [](const char* key) { WriteCheckMyProfileIntArray("s", key, ints, 2, kFile); },
-     "Error in WriteMyProfileIntArray: section s, key , file /nowhere/a.par\n"},
-    {"Int64Array", [](const char* key) { WriteCheckMyProfileInt64Array("s", key, wide, 2, kFile); },
-     "Error in WriteMyProfileInt64Array: section s, key , file /nowhere/a.par\n"},
-    {"Int", [](const char* key) { WriteCheckMyProfileInt("s", key, -17, kFile); },
-     "Error in WriteMyProfileInt: section s, key , value -17, file /nowhere/a.par\n"},
-    {"Int64", [](const char* key) { WriteCheckMyProfileInt64("s", key, 9007199254740993, kFile); },
-     "Error in WriteMyProfileInt64: section s, key , value 9007199254740993.000000, file /nowhere/a.par\n"},
-    {"LongArray", [](const char* key) { WriteCheckMyProfileLongArray("s", key, ints, 2, kFile); },
-     "Error in WriteMyProfileLongArray: section s, key , file /nowhere/a.par\n"},
-    {"Double", [](const char* key) { WriteCheckMyProfileDouble("s", key, 17.3, kFile); },
-     "Error in WriteMyProfileDouble: section s, key , value 17.300000, file /nowhere/a.par\n"},
-    {"FloatArray", [](const char* key) { WriteCheckMyProfileFloatArray("s", key, floats, 2, kFile); },
-     "Error in WriteMyProfileDouble: section s, key , file /nowhere/a.par\n"},
-    {"DoubleArray", [](const char* key) { WriteCheckMyProfileDoubleArray("s", key, doubles, 2, kFile); },
-     "Error in WriteMyProfileDouble: section s, key , file /nowhere/a.par\n"},
-};
-
-class ProfileCheck : public testing::TestWithParam<Wrapper> {};
-
-TEST_P(ProfileCheck, EndsTheProcessUnlessTheValueIsThere) {
-    const std::string name = GetParam().name;
-    const bool reads = name.starts_with("Get");
-    EXPECT_EXIT(GetParam().call(reads ? kKey : nullptr), testing::ExitedWithCode(1),
-                testing::Eq(GetParam().message));
-    EXPECT_EQ(GetSetProfileChar(0, "s", kKey, nullptr, kFile), nullptr);
-    if (reads) GetSetProfileChar(1, "s", kKey, name == "GetStringArray" ? R"({"3" "4"})" : "{3 4}", kFile);
-    GetParam().call(kKey);
-    EXPECT_NE(GetSetProfileChar(0, "s", kKey, nullptr, kFile), nullptr);
-    FreeProfile(kFile);
+/** A function with all its arguments but the key. */
+template <typename Function, typename... Data>
+auto call(Function function, Data... data) {
+    return [=](const char* key) { return function("s", key, data..., kFile); };
 }
-INSTANTIATE_TEST_SUITE_P(Wrappers, ProfileCheck, testing::ValuesIn(kWrappers),
-                         [](const auto& row) { return std::string{row.param.name}; });
 
-// The plain function gives the number of strings read for its status: one too few is a failure, none at all is
-// not.
-TEST(ProfileReadCheck, TooFewElementsEndTheProcess) {
-    GetSetProfileChar(1, "s", kKey, "{3}", kFile);
-    EXPECT_EXIT(GetCheckMyProfileIntArray("s", kKey, ints, 2, kFile), testing::ExitedWithCode(1),
-                "Error in GetMyProfileIntArray");
-    GetSetProfileChar(1, "s", kKey, R"({"3"})", kFile);
-    EXPECT_EXIT(GetCheckMyProfileStringArray("s", kKey, strings, 2, 8, kFile), testing::ExitedWithCode(1),
-                "Error in GetMyProfileStringArray");
-    GetSetProfileChar(1, "s", kKey, "{}", kFile);
-    GetCheckMyProfileStringArray("s", kKey, strings, 2, 8, kFile);
+/** A wrapper, and what it says between its first words and the file when there is no value or no key. */
+struct Wrapper {
+    std::function<void(const char* key)> call;
+    const char *function, *end;
+};
+const Wrapper kReaders[] = {
+    {call(GetCheckMyProfileString, text, 8), "GetMyProfileString", ""},
+    {call(GetCheckMyProfileStringArray, strings, 2, 8), "GetMyProfileStringArray", ""},
+    {call(GetCheckMyProfileIntArray, ints, 2), "GetMyProfileIntArray", ""},
+    {call(GetCheckMyProfileInt64Array, wide, 2), "GetMyProfileInt64Array", ""},
+    {call(GetCheckMyProfileLongArray, ints, 2), "GetMyProfileIntArray", ""},
+    {call(GetCheckMyProfileFloatArray, floats, 2), "GetMyProfileFloatArray", ""},
+    {call(GetCheckMyProfileDoubleArray, doubles, 2), "WriteMyProfileDouble", ""},
+};
+const Wrapper kWriters[] = {
+    {call(WriteCheckMyProfileString, "17.3"), "WriteMyProfileString", ", string 17.3"},
+    {call(WriteCheckMyProfileIntArray, ints, 2), "WriteMyProfileIntArray", ""},
+    {call(WriteCheckMyProfileInt64Array, wide, 2), "WriteMyProfileInt64Array", ""},
+    {call(WriteCheckMyProfileInt, -17), "WriteMyProfileInt", ", value -17"},
+    {call(WriteCheckMyProfileInt64, 9007199254740993), "WriteMyProfileInt64", ", value 9007199254740993.000000"},
+    {call(WriteCheckMyProfileLongArray, ints, 2), "WriteMyProfileLongArray", ""},
+    {call(WriteCheckMyProfileDouble, 17.3), "WriteMyProfileDouble", ", value 17.300000"},
+    {call(WriteCheckMyProfileFloatArray, floats, 2), "WriteMyProfileDouble", ""},
+    {call(WriteCheckMyProfileDoubleArray, doubles, 2), "WriteMyProfileDouble", ""},
+};
+
+void expect_end(const Wrapper& wrapper, const char* key) {
+    EXPECT_EXIT(wrapper.call(key), testing::ExitedWithCode(1),
+                testing::Eq(std::string{"Error in "} + wrapper.function + ": section s, key " + (key ? key : "") +
+                            wrapper.end + ", file " + kFile + "\n"));
+}
+
+TEST(ProfileCheck, EndsTheProcessUnlessTheValueIsThere) {
+    for (const Wrapper& reader : kReaders) {
+        expect_end(reader, kKey);
+        GetSetProfileChar(1, "s", kKey, &reader == &kReaders[1] ? R"({"3" "4"})" : "{3 4}", kFile);
+        reader.call(kKey);
+        // The plain function gives the number of strings read for its status: one too few is a failure, none at
+        // all is not.
+        GetSetProfileChar(1, "s", kKey, R"({"3"})", kFile);
+        if (&reader != &kReaders[0]) expect_end(reader, kKey);
+        GetSetProfileChar(1, "s", kKey, "{}", kFile);
+        if (&reader == &kReaders[1]) reader.call(kKey);
+        FreeProfile(kFile);
+    }
+    for (const Wrapper& writer : kWriters) {
+        expect_end(writer, nullptr);
+        writer.call(kKey);
+        EXPECT_NE(GetSetProfileChar(0, "s", kKey, nullptr, kFile), nullptr);
+        FreeProfile(kFile);
+    }
+}
+
+using Plain = std::function<int(const char* key)>;
+
+TEST(ProfilePlain, SaysNothingOfAMissingKeyAndWarnsOfRefusedWrites) {
+    const test::Report report;
+    const Plain readers[] = {call(GetMyProfileString, text, 8),      call(GetMyProfileStringArray, strings, 2, 8),
+                             call(GetMyProfileIntArray, ints, 2),    call(GetMyProfileInt64Array, wide, 2),
+                             call(GetMyProfileLongArray, ints, 2),   call(GetMyProfileFloatArray, floats, 2),
+                             call(GetProfileDoubleArray, doubles, 2)};
+    const Data before = data;
+    for (const Plain& read : readers) EXPECT_EQ(read(kKey), 10);
+    EXPECT_TRUE(data == before);
+    EXPECT_EQ(report.entries().size(), 0U);
+
+    const char* const word = "t";
+    const Plain writers[] = {call(WriteMyProfileStringQuote, word), call(WriteMyProfileStringArray, &word, 1),
+                             call(WriteMyProfileStringMatrix, &word, 1, 1),
+                             call(WriteMyProfileDoubleMatrix, doubles, 1, 1)};
+    for (const Plain& write : writers) EXPECT_EQ(write(nullptr), 10);
+    EXPECT_EQ(
+        report.messages("WARNING"),
+        std::vector<std::string>(4, "Parameter writing failed - SEC: s, KEY: , FILE: " + std::string{kFile}));
+    EXPECT_EQ(report.entries().front().function, "WriteMyProfileStringQuote");
+
+    GetSetProfileChar(1, "s", kKey, "{\"1\" 2}", kFile);
+    const Plain without_data[] = {call(GetMyProfileIntArray, nullptr, 2), call(WriteMyProfileIntArray, nullptr, 2),
+                                  call(WriteMyProfileString, nullptr), call(WriteMyProfileStringQuote, nullptr),
+                                  call(GetMyProfileStringArray, nullptr, 1, 10)};
+    for (const Plain& missing : without_data) EXPECT_EQ(missing(kKey), 10);
+    EXPECT_EQ(report.entries("WARNING").size(), 9U);
+    EXPECT_STREQ(GetSetProfileChar(0, "s", kKey, nullptr, kFile), "{\"1\" 2}");
 }
 
 TEST(ProfilePar, SetFormsReachTheDiskAtOnceAndGetFormsReadThem) {
@@ -98,6 +125,7 @@ TEST(ProfilePar, SetFormsReachTheDiskAtOnceAndGetFormsReadThem) {
     const char* const file = path.c_str();
     EXPECT_EQ(SetParString(file, "Name", -1, "a b", 0, "s"), 0);
     EXPECT_EQ(test::read_text(path), "\n[s]\nName = a b\n");
+    data = {};
     EXPECT_EQ(SetParInt(file, "Int", 2, ints, 0, "s"), 0);
     EXPECT_EQ(SetParFloat(file, "Float", 2, floats, 0, "s"), 0);
     EXPECT_EQ(SetParDouble(file, "Double", 2, doubles, 0, "t"), 0);
@@ -105,37 +133,26 @@ TEST(ProfilePar, SetFormsReachTheDiskAtOnceAndGetFormsReadThem) {
               "\n[s]\nName = a b\nInt = {17 29}\nFloat = {17.5 29.5}\n\n[t]\nDouble = {17.5 29.5}\n");
 
     FreeProfile(file);
-    char name[512];
+    std::string name(513, '#');
     std::array<int, 2> int_values{};
     std::array<float, 2> float_values{};
     std::array<double, 2> double_values{};
-    EXPECT_EQ(GetParString(file, "Name", -1, name, 0, "s"), 0);
+    EXPECT_EQ(GetParString(file, "Name", 3, name.data(), 0, "s"), 0);
     EXPECT_EQ(GetParInt(file, "Int", 2, int_values.data(), 0, "s"), 0);
     EXPECT_EQ(GetParFloat(file, "Float", 2, float_values.data(), 0, "s"), 0);
     EXPECT_EQ(GetParDouble(file, "Double", 2, double_values.data(), 0, "t"), 0);
-    EXPECT_STREQ(name, "a b");
+    EXPECT_EQ(name, "a b" + std::string(509, '\0') + "#") << "in 512 bytes, whatever the count";
     EXPECT_THAT(int_values, ElementsAre(17, 29));
     EXPECT_THAT(float_values, ElementsAre(17.5F, 29.5F));
     EXPECT_THAT(double_values, ElementsAre(17.5, 29.5));
     EXPECT_EQ(GetParDouble(file, "Double", 2, double_values.data(), 0, "s"), 10);
-}
 
-TEST(ProfilePar, StringsAreCutTo511Bytes) {
-    GetSetProfileChar(1, "s", kKey, std::string(600, 'v').c_str(), kFile);
-    std::string buffer(513, '#');
-    EXPECT_EQ(GetParString(kFile, kKey, 3, buffer.data(), 0, "s"), 0);
-    EXPECT_EQ(buffer, std::string(511, 'v') + std::string("\0#", 2));
-}
-
-// The status is that of the write. A missing path must not turn into the sync of every file.
-TEST(ProfilePar, SetFormsReturnTheStatusOfTheWrite) {
-    const test::TemporaryFolder folder;
-    const std::string path = folder.file("a.par");
-    GetSetProfileChar(1, "s", kKey, "v", path.c_str());
+    // The status is that of the write. A missing path must not turn into the sync of every file.
+    GetSetProfileChar(1, "s", "Name", "v", file);
     EXPECT_EQ(SetParInt(kFile, kKey, 2, ints, 0, "s"), 0) << "though it cannot be synced";
     EXPECT_EQ(SetParInt(kFile, nullptr, 2, ints, 0, "s"), 10);
     EXPECT_EQ(SetParInt(nullptr, kKey, 2, ints, 0, "s"), 10);
-    EXPECT_EQ(test::read_text(path), "");
+    EXPECT_TRUE(test::read_text(path).starts_with("\n[s]\nName = a b\n"));
 }
 
 }  // namespace

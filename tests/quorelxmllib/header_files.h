@@ -4,7 +4,6 @@
 #include <cstdint>
 #include <string>
 #include <string_view>
-#include <vector>
 
 #include "quo_base/quorelxml_v2.h"
 #include "support/diagnostics.h"
@@ -40,13 +39,11 @@ inline std::string header_text(std::string_view inside) {
            std::string{inside} + "  </Channel>\n</QuorelXmlDoc>\n";
 }
 
-/** The names of a folder's entries: a failed save must leave nothing behind. */
-inline std::vector<std::string> entries(const TemporaryFolder& folder) {
-    std::vector<std::string> names;
-    for (const auto& entry : std::filesystem::directory_iterator{folder.path()})
-        names.push_back(entry.path().filename().string());
-    std::ranges::sort(names);
-    return names;
+/** A text with its first `from` replaced. */
+inline std::string replaced(std::string text, std::string_view from, std::string_view to) {
+    const auto place = text.find(from);
+    EXPECT_NE(place, text.npos) << from;
+    return text.replace(place, from.size(), to);
 }
 
 }  // namespace test

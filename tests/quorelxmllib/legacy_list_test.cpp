@@ -1,5 +1,6 @@
 #include "quorelxmllib/legacy_list.h"
 
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <locale.h>
 
@@ -8,6 +9,7 @@
 #include <limits>
 #include <numbers>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "support/diagnostics.h"
@@ -20,63 +22,51 @@ using quo::scan_list;
 TEST(ListFormat, RepeatsTheItemAndEndsWithTheLast) {
     const char* const expected[] = {"%.15g, %.15g, %.15g", "%.15g, %.15g, %.15g", "%d, %d, %d", "%s, \n%s, \n%s"};
     for (int type = 0; type <= 3; ++type) {
-        const std::string format = list_format(100000, type), last = list_format(1, type);
+        const std::string format = list_format(100000, type);
         EXPECT_EQ(list_format(3, type), expected[type]);
         EXPECT_TRUE(format.size() < 4096U && format.size() > 4080U) << "cut to whole items within its room";
-        EXPECT_TRUE(format.ends_with(" " + last) || format.ends_with("\n" + last));
+        EXPECT_TRUE(format.ends_with(list_format(2, type)));
     }
-    for (const int bad : {-1, 4}) EXPECT_EQ(list_format(2, bad), "");
-    EXPECT_EQ(list_format(0, 0), "");
+    EXPECT_EQ(list_format(2, -1) + list_format(2, 4) + list_format(0, 0), "");
 }
-
-struct ListCase {
-    const char* text;
-    std::vector<double> values;
-};
-const double kInfinity = std::numeric_limits<double>::infinity();
-const ListCase kLists[] = {
-    {"1.5, 2.5, 3.5", {1.5, 2.5, 3.5}},
-    {"1.5,2.5,3.5", {1.5, 2.5, 3.5}},
-    {"\n  1.5,\n\t2.5,   3.5\n", {1.5, 2.5, 3.5}},
-    {"-1.25e-300, +4E3, 7.", {-1.25e-300, 4000.0, 7.0}},
-    {"1e999, -1e999, 1e-999", {kInfinity, -kInfinity, 0.0}},
-    {"1.5, 2.5", {1.5, 2.5}},
-    {"1.5, 2.5,", {1.5, 2.5}},
-    {"1.5, two, 3.5", {1.5}},
-    {"1.5 2.5 3.5", {1.5}},
-    {"1.5 , 2.5", {1.5}},
-    {"", {}},
-    {", 2.5", {}},
-    {"%n%s, %n", {}},
-};
 
 TEST(ScanList, ReadsWhatFitsAndLeavesTheRest) {
-    for (const ListCase& row : kLists) {
-        SCOPED_TRACE(row.text);
-        std::vector<double> expected = row.values, values(3, -17.3);
+    const double kInfinity = std::numeric_limits<double>::infinity();
+    const std::pair<const char*, std::vector<double>> rows[] = {
+        {"\n  1.5,\n\t2.5,   3.5\n", {1.5, 2.5, 3.5}},
+        {"-1.25e-300, +4E3,7.", {-1.25e-300, 4000.0, 7.0}},
+        {"1e999, -1e999, 1e-999", {kInfinity, -kInfinity, 0.0}},
+        {"1.5, 2.5,", {1.5, 2.5}},
+        {"1.5, two, 3.5", {1.5}},
+        {"1.5 2.5 3.5", {1.5}},
+        {"1.5 , 2.5", {1.5}},
+        {"", {}},
+        {", 2.5", {}},
+        {"%n%s, %n", {}}};
+    for (const auto& [text, read] : rows) {
+        std::vector<double> expected = read, values(3, -17.3);
         expected.resize(3, -17.3);
-        EXPECT_EQ(scan_list(row.text, values.data(), 3), static_cast<int>(row.values.size()));
-        EXPECT_EQ(values, expected);
+        EXPECT_EQ(scan_list(text, values.data(), 3), static_cast<int>(read.size())) << text;
+        EXPECT_EQ(values, expected) << text;
     }
-}
-
-TEST(ScanList, NarrowsFloatsAndBoundsInts) {
     float floats[2] = {};
     EXPECT_EQ(scan_list("0.1, 1e300", floats, 2), 2);
-    EXPECT_EQ(floats[0], 0.1F);
-    EXPECT_TRUE(std::isinf(floats[1]));
+    EXPECT_TRUE(floats[0] == 0.1F && std::isinf(floats[1]));
     std::int32_t ints[4] = {};
     EXPECT_EQ(scan_list("-7, 2147483647, 3000000000, -3000000000", ints, 4), 4);
-    EXPECT_EQ(ints[0], -7);
-    EXPECT_EQ(ints[1], std::numeric_limits<std::int32_t>::max());
-    EXPECT_EQ(ints[2], std::numeric_limits<std::int32_t>::max());
-    EXPECT_EQ(ints[3], std::numeric_limits<std::int32_t>::min());
+    EXPECT_THAT(ints, testing::ElementsAre(-7, INT32_MAX, INT32_MAX, INT32_MIN));
+    for (const std::size_t digits : {511U, 512U, 5000U}) {
+        double value = -17.3;
+        const std::string text = "0." + std::string(digits, '1') + "e" + std::string(digits, '0') + "1, 2.5";
+        EXPECT_EQ(scan_list(text.c_str(), &value, 1), 1);
+        EXPECT_NEAR(value, 1.0 / 9.0, 1e-15) << digits;
+    }
 }
 
 // Every length around the blocks of the scan, and one whose format would not fit into 4096 characters. Each number
 // must come back to the last bit.
 TEST(ScanList, ReadsListsOfAnyLength) {
-    for (const int count : {2, 31, 32, 33, 63, 64, 65, 96, 5001}) {
+    for (const int count : {2, 31, 32, 33, 64, 65, 5001}) {
         SCOPED_TRACE(count);
         std::vector<double> expected;
         std::string text;
@@ -91,15 +81,6 @@ TEST(ScanList, ReadsListsOfAnyLength) {
         EXPECT_EQ(scan_list(text.c_str(), values.data(), count + 1), count);
         expected.push_back(-17.3);
         EXPECT_EQ(values, expected);
-    }
-}
-
-TEST(ScanList, TakesNumbersOfAnyLength) {
-    for (const std::size_t digits : {511U, 512U, 5000U}) {
-        double value = -17.3;
-        const std::string text = "0." + std::string(digits, '1') + "e" + std::string(digits, '0') + "1, 2.5";
-        EXPECT_EQ(scan_list(text.c_str(), &value, 1), 1);
-        EXPECT_NEAR(value, 1.0 / 9.0, 1e-15) << digits;
     }
 }
 

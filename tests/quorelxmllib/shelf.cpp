@@ -1,7 +1,7 @@
 #include "shelf.h"
 
-#include "header_files.h"
 #include "quorelxmllib/field_table.h"
+#include "support/diagnostics.h"
 #include "support/fields.h"
 
 namespace test {
@@ -12,7 +12,6 @@ constexpr quo::FieldTable kTable{
     "Shelf",
     QUO_FIELD(pages, "Pages", QUO_LENGTH(nBooks, 3)),
     QUO_FIELD(width, "ShelfWidth"),
-    QUO_FIELD(height, quo::bounds(0, 10)),
     QUO_FIELD(boards, quo::bounds(1, 1000), quo::kOptional),
     QUO_FIELD(label),
     QUO_FIELD(code, quo::kXmlOnly),
@@ -20,6 +19,7 @@ constexpr quo::FieldTable kTable{
     QUO_FIELD(shape, QUO_LENGTH(nBooks)),
     QUO_FIELD(nBooks, "Books"),
     QUO_FIELD(weights, QUO_LENGTH(nBooks), quo::kOptional),
+    QUO_FIELD(height, quo::bounds(0, 10)),  // a value behind the length
 };
 
 }  // namespace
@@ -44,30 +44,6 @@ void Shelf::fill(int books) {
 
 bool Shelf::operator==(const Shelf& other) const { return differing_fields(*this, other).empty(); }
 
-std::string Shelf::text() {
-    return header_text(R"(    <Shelf>
-      <pages>
-        <val N="1">1.5</val>
-        <val N="2">2.5</val>
-        <val N="3">3.5</val>
-        <val N="4">4.5</val>
-        <val N="5">5.5</val>
-        <val N="6">6.5</val>
-      </pages>
-      <width>2.25</width>
-      <height>0.5</height>
-      <boards>3</boards>
-      <label>Novels</label>
-      <code>N-1</code>
-      <corner_m>1.5, 2.5, 3.5, 4.5</corner_m>
-      <shape>
-        <val N="1">1</val>
-        <val N="2">2</val>
-      </shape>
-      <nBooks>2</nBooks>
-      <ConfigurationFile>/etc/shelf.conf</ConfigurationFile>
-    </Shelf>
-)");
-}
+std::string Shelf::text() { return read_text(QUO_TEST_DATA "/headers/shelf.xml"); }
 
 }  // namespace test

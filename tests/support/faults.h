@@ -47,6 +47,7 @@ struct Watch {
     long descriptors;  ///< of files in the folder that are open
     bool reached;      ///< the fault has happened
     bool returned;     ///< the job came back: what is open then stays open
+    bool blocks;       ///< it left tracked memory
 };
 
 /** From here on this process, which must not end but by exec or exit, is watched. Its system calls on the folder

@@ -87,8 +87,8 @@ int dpolfit(const double* x, const double* y, int n, double* c, int degree) {
     PowerSums sums{work.data(), terms};
     sums.add(x, y, n);
     sums.store(a, b);
-    // Deliberate: a singular system leaves whatever the elimination produced.
-    static_cast<void>(ldgaussj(a, terms, b, 1));
+    // Callers use what the elimination leaves of a singular system; without memory it did not even begin.
+    if (ldgaussj(a, terms, b, 1) == QUO_NO_MEMORY) return frame.silent(QUO_NO_MEMORY);
     for (int i = 0; i < terms; ++i) c[i] = b[i + 1][1];
     free_ldmatrix(b, 1, terms, 1, 1);
     free_ldmatrix(a, 1, terms, 1, terms);

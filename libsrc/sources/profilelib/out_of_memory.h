@@ -16,8 +16,8 @@ inline constexpr const char* kNoMoreMemory = "Memory re-allocation failure\n";
     std::exit(EXIT_FAILURE);
 }
 
-/** Runs a step of the store. Deliberate: there is no way back from a failed allocation, the process ends with
- * status 1, because every caller counts on a value that was set being there. */
+/** Runs a step of the store. There is no way back from a failed allocation: the process ends with status 1,
+ * because every caller counts on a value that was set being there. */
 template <typename Step>
 decltype(auto) or_end_process(const char* message, Step&& step) noexcept {
     try {

@@ -38,7 +38,7 @@ public:
         return warn("Parameter writing failed", line);
     }
     [[nodiscard]] int success(int line = __builtin_LINE()) noexcept { return frame_.success(line); }
-    /** A result that is deliberately not reported. */
+    /** A result that is no news: callers ask for keys that may be missing. */
     [[nodiscard]] int silent(int status) noexcept { return frame_.silent(status); }
     [[nodiscard]] int too_few(int read, int wanted, int line = __builtin_LINE()) noexcept {
         char what[80];
@@ -188,10 +188,11 @@ StringScan scan_strings(std::string_view text, char* const* strings, int count, 
 int read_strings(Access& access, char* const* strings, int count, int room, int line = __builtin_LINE()) noexcept {
     const char* const text = access.value();
     if (!text) return access.silent(QUO_NUMERIC);
-    // Deliberate: a value that is no list counts as read.
+    // A value that is no list leaves the strings as they are, which callers count as read.
     if (*text != '{') return access.success(line);
     const auto [read, stop] = scan_strings(text + 1, strings, strings ? count : 0, room);
-    // Deliberate: an early closing brace gives the count for a status, anything else but a quote a success.
+    // An early closing brace gives the count for a status: a list that is whole but short is told from one that
+    // breaks off. Anything else but a quote ends it as a success.
     if (stop == '}' && read > 0) return access.silent(read);
     return stop == '\0' && read < count ? access.too_few(read, count, line) : access.success(line);
 }

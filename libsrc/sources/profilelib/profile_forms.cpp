@@ -62,7 +62,7 @@ extern "C" void GetCheckMyProfileInt64Array(const char* section, const char* key
 
 extern "C" void GetCheckMyProfileLongArray(const char* section, const char* key, int32_t* values, int count,
                                            const char* file) noexcept {
-    // Deliberate: the message names another function.
+    // This message and three below name another function: they are kept as users have known them.
     if (GetMyProfileLongArray(section, key, values, count, file) != 0)
         end_failed_check("GetMyProfileIntArray", section, key, file);
 }
@@ -116,21 +116,18 @@ extern "C" void WriteCheckMyProfileDouble(const char* section, const char* key, 
 
 extern "C" void WriteCheckMyProfileFloatArray(const char* section, const char* key, const float* values, int count,
                                               const char* file) noexcept {
-    // Deliberate: the message names another function.
     if (WriteMyProfileFloatArray(section, key, values, count, file) != 0)
         end_failed_check("WriteMyProfileDouble", section, key, file);
 }
 
 extern "C" void WriteCheckMyProfileDoubleArray(const char* section, const char* key, const double* values,
                                                int count, const char* file) noexcept {
-    // Deliberate: the message names another function.
     if (WriteProfileDoubleArray(section, key, values, count, file) != 0)
         end_failed_check("WriteMyProfileDouble", section, key, file);
 }
 
 extern "C" void GetCheckMyProfileDoubleArray(const char* section, const char* key, double* values, int count,
                                              const char* file) noexcept {
-    // Deliberate: the message names another function.
     if (GetProfileDoubleArray(section, key, values, count, file) != 0)
         end_failed_check("WriteMyProfileDouble", section, key, file);
 }

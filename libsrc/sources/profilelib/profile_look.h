@@ -17,7 +17,7 @@ public:
     ProfileLook& operator=(const ProfileLook&) = delete;
 
 private:
-    bool begun_;
+    const char* file_ = nullptr;  // null where this look is to forget nothing
 };
 
 }  // namespace quo

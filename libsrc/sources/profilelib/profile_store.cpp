@@ -51,7 +51,7 @@ int ProfileStore::sync(std::string_view path) {
 int ProfileStore::sync_all() {
     int status = 0;
     for (const File& file : files_) status = write(file);
-    // Deliberate: callers know the result of the file loaded last, inverted.
+    // Inverted: callers of this form know -1 as its success.
     return status == 0 ? -1 : 0;
 }
 
@@ -107,16 +107,17 @@ bool ProfileStore::begin_look(std::string_view path) {
     return true;
 }
 
-void ProfileStore::end_look() {
-    free(looked_into_.back());
-    looked_into_.pop_back();
+void ProfileStore::end_look(std::string_view path) {
+    free(path);
+    std::erase(looked_into_, path);
 }
 
-ProfileLook::ProfileLook(const char* file) noexcept
-    : begun_{file && or_end_process(kNoMemory, [&] { return ProfileStore::instance().begin_look(file); })} {}
+ProfileLook::ProfileLook(const char* file) noexcept {
+    if (file && or_end_process(kNoMemory, [&] { return ProfileStore::instance().begin_look(file); })) file_ = file;
+}
 
 ProfileLook::~ProfileLook() {
-    if (begun_) ProfileStore::instance().end_look();
+    if (file_) ProfileStore::instance().end_look(file_);
 }
 
 }  // namespace quo

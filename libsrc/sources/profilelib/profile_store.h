@@ -31,9 +31,9 @@ public:
     void free_all();
 
     /** For ProfileLook. True, unless the file is in memory or being looked into already; end_look() then forgets
-     * the file of the last look that began so. `path` stands until then. */
+     * the file, in whatever order looks end. `path` stands until then. */
     bool begin_look(std::string_view path);
-    void end_look();
+    void end_look(std::string_view path);
 
 private:
     struct File {
@@ -48,7 +48,7 @@ private:
 
     std::list<File> files_;  // in the order of loading
     std::unordered_map<std::string_view, std::list<File>::iterator> by_path_;
-    std::vector<std::string_view> looked_into_;  // the innermost last
+    std::vector<std::string_view> looked_into_;  // each by the look that began it
     File* current_ = nullptr;                    // the one used last, which most calls ask for again
 };
 

@@ -1,14 +1,23 @@
-#ifndef QUO_TESTS_LIST_MODEL_H
-#define QUO_TESTS_LIST_MODEL_H
+#ifndef QUO_FUZZ_PROFILE_PROPERTY_H
+#define QUO_FUZZ_PROFILE_PROPERTY_H
+
+/* What holds for any bytes as a parameter file, and for any text as a value: the fuzzer and the tests both ask. */
 
 #include <algorithm>
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <iterator>
 #include <optional>
-#include <random>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
 
-namespace test {
+#include "profilelib/profile_content.h"
+#include "quo_base/profile.h"
+
+namespace property {
 
 /** What a parameter file means, told the slow way: one character after the other, lists searched from the end. */
 class ListModel {
@@ -110,27 +119,61 @@ private:
     }
 };
 
-/** Random files and choices, the same on every machine. */
-class Dice {
-public:
-    explicit Dice(unsigned seed) : engine_{seed} {}
-    unsigned below(unsigned bound) { return static_cast<unsigned>(engine_() % bound); }
-    /** A text of characters from `alphabet`. */
-    std::string text(std::string_view alphabet, unsigned longest) {
-        std::string made(below(longest + 1), '\0');
-        for (char& c : made) c = alphabet[below(static_cast<unsigned>(alphabet.size()))];
-        return made;
-    }
-    std::string bytes(unsigned longest) {
-        std::string made(below(longest + 1), '\0');
-        for (char& c : made) c = static_cast<char>(below(256));
-        return made;
-    }
+inline std::string written(const quo::ProfileContent& content) {
+    std::string text;
+    content.write([&text](std::string_view piece) { return text += piece, true; });
+    return text;
+}
 
-private:
-    std::mt19937 engine_;  // its sequence is fixed by the standard, those of the distributions are not
-};
+/** What is wrong with the way a text is read as a parameter file, answered for and written back; empty where
+ * nothing is. Each name that stands in it, and one that does not, must be answered as the lists do. */
+inline std::string content_breach(const std::string& text) {
+    quo::ProfileContent content, again;
+    const ListModel model{text};
+    content.parse(text);
+    if (written(content) != model.text()) return "written otherwise";
+    std::set<std::string> names{"none"}, keys{"none"};
+    for (const auto& section : model.sections) {
+        if (section.name) names.insert(*section.name);
+        for (const auto& key : section.keys) keys.insert(key.name);
+    }
+    if (names.size() * keys.size() > 10000) return "";  // a fuzzer's long file would take seconds
+    for (const auto& name : names)
+        for (const auto& key : keys) {
+            const char* const found = content.find(name, key);
+            if ((found ? std::optional<std::string>{found} : std::nullopt) != model.get(name, key))
+                return "[" + name + "] " + key + " is answered otherwise";
+        }
+    // An empty key name, which only a NUL byte leaves, does not read back.
+    again.parse(written(content));
+    return text.find('\0') != text.npos || written(again) == written(content) ? "" : "reads back otherwise";
+}
 
-}  // namespace test
+/** The same of the readers of typed values: they must stay within their arrays whatever a value looks like. The
+ * address sanitizer watches what stands behind the arrays' spare last elements. */
+inline std::string value_breach(const std::string& value) {
+    constexpr const char* kFile = "/nowhere/property.par";
+    constexpr int kCount = 3, kRoom = 5;
+    GetSetProfileChar(1, "s", "k", value.c_str(), kFile);
+    std::array<int, kCount + 1> ints{};
+    std::array<int64_t, kCount + 1> wide{};
+    std::array<float, kCount + 1> floats{};
+    std::array<double, kCount + 1> doubles{};
+    std::array<std::array<char, kRoom + 1>, kCount + 1> rooms{};
+    char* const strings[kCount] = {rooms[0].data(), rooms[1].data(), rooms[2].data()};
+    GetMyProfileIntArray("s", "k", ints.data(), kCount, kFile);
+    GetMyProfileInt64Array("s", "k", wide.data(), kCount, kFile);
+    GetMyProfileFloatArray("s", "k", floats.data(), kCount, kFile);
+    GetProfileDoubleArray("s", "k", doubles.data(), kCount, kFile);
+    GetMyProfileStringArray("s", "k", strings, kCount, kRoom, kFile);
+    GetMyProfileString("s", "k", rooms.back().data(), kRoom, kFile);
+    DelProfileSection("s", kFile);
+    if (ints.back() != 0 || wide.back() != 0 || floats.back() != 0.0F || doubles.back() != 0.0)
+        return "numbers run over";
+    const bool within = std::ranges::all_of(rooms, [](const auto& room) { return room[kRoom - 1] == '\0'; });
+    return within ? "" : "a string runs over";
+}
+
+}  // namespace property
 
 #endif

@@ -1,5 +1,5 @@
 // Makes the product header of a scene from its facts, with the library's own writers.
-// Usage: make_header SCENE_facts.json SCENE.xml
+// Usage: make_scene_header SCENE_facts.json SCENE.xml
 
 #include <algorithm>
 #include <cmath>
@@ -133,14 +133,14 @@ void make_header(const char* facts_name, const char* header) {
 
 int main(int argc, char** argv) {
     if (argc != 3) {
-        std::fputs("Usage: make_header SCENE_facts.json SCENE.xml\n", stderr);
+        std::fputs("Usage: make_scene_header SCENE_facts.json SCENE.xml\n", stderr);
         return 2;
     }
     try {
         make_header(argv[1], argv[2]);
         return 0;
     } catch (const std::exception& failure) {
-        std::fprintf(stderr, "make_header: %s: %s\n", argv[1], failure.what());
+        std::fprintf(stderr, "make_scene_header: %s: %s\n", argv[1], failure.what());
         return 1;
     }
 }
