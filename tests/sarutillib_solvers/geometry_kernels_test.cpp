@@ -22,7 +22,7 @@ TEST(Geodetic, ReturnsFromEveryPlaceAndHeight) {
                     SCOPED_TRACE(testing::Message() << latitude << " " << longitude << " " << height);
                     const test::Vec3 p =
                         test::geodetic_point(latitude, longitude, height, body.equatorial_m, body.polar_m);
-                    const auto g = quo::to_geodetic(quo::load(p.v), body);
+                    const GeodeticPoint g = quo::to_geodetic(quo::load(p.v), body);
                     const double rounding = 4e-16 * test::norm(p);
                     EXPECT_NEAR(g.height_m, height, 2.0 * rounding);
                     EXPECT_LT(test::norm(test::geodetic_point(g.latitude_deg, g.longitude_deg, g.height_m,

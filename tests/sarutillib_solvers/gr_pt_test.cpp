@@ -7,6 +7,7 @@
 #include <limits>
 #include <random>
 
+#include "quo_base/geometry.h"
 #include "support/diagnostics.h"
 #include "support/geometry.h"
 
@@ -35,6 +36,9 @@ struct Request {
     Request(const Platform& sat, double range)
         : S{sat.position}, V{sat.velocity}, tau{2.0 * range / kLightSpeed} {}
     int gr_pt(Vec3& P) const { return ::gr_pt(P.v, S.v, V.v, tau, fd, lambda, omega, side, a, b); }
+    int gr_pt_at_height(double height, Vec3& P) const {
+        return ::gr_pt_at_height(P.v, S.v, V.v, tau, fd, lambda, omega, side, height, a, b);
+    }
     int gr_pt0(Vec3& P) const { return ::gr_pt0(P.v, S.v, V.v, tau, fd, lambda, omega, side, a, b); }
 };
 
@@ -116,6 +120,19 @@ TEST(GrPtSwept, FindsWhateverARayMeets) {
         ASSERT_LT(norm(start - P), 1e-3);
         if (solved % 50 == 0) expect_solution(look, P);
         ASSERT_NEAR(test::height_above_ellipsoid(P), 0.0, kOnTheGround);
+
+        // The same from a place above or below it.
+        Vec3 same{}, raised{};
+        ASSERT_EQ(look.gr_pt_at_height(0.0, same), 0);
+        ASSERT_TRUE(std::equal(same.v, same.v + 3, P.v));
+        const double up_m = aircraft ? between(-400.0, 5e3) : between(-400.0, 36e3);
+        const Vec3 place = P + up_m * test::unit(test::ellipsoid_gradient(P));
+        const Vec3 line = place - sat.position;
+        look.tau = 2.0 * norm(line) / kLightSpeed;
+        look.fd = 2.0 / look.lambda * dot(over_ground, line) / norm(line);
+        ASSERT_EQ(look.gr_pt_at_height(up_m, raised), 0);
+        ASSERT_LT(norm(raised - place), 1e-4);
+        ASSERT_NEAR(test::height_above_ellipsoid(raised), up_m, 1.1e-7);
     }
 }
 
@@ -188,13 +205,15 @@ TEST(GrPtFaults, GiveAStatusAndNoPoint) {
         Vec3 P{17.3, 18.3, 19.3};
         EXPECT_EQ(look.gr_pt0(P), fault.status);
         EXPECT_EQ(look.gr_pt(P), fault.status);
+        EXPECT_EQ(look.gr_pt_at_height(17.3, P), fault.status);
         EXPECT_EQ(P[0] + P[1] + P[2], 17.3 + 18.3 + 19.3);
 
         const auto entries = report.entries("ERROR"), tree = report.entries("ERROR_CALL_TREE");
-        ASSERT_EQ(entries.size(), 2U) << "one of either call";
+        ASSERT_EQ(entries.size(), 3U) << "one of every call";
         EXPECT_EQ(entries[1].function, "gr_pt0");
-        ASSERT_EQ(tree.size(), 1U);
+        ASSERT_EQ(tree.size(), 2U);
         EXPECT_EQ(tree[0].function, "gr_pt");
+        EXPECT_EQ(tree[1].function, "gr_pt_at_height");
     }
 }
 
@@ -211,6 +230,8 @@ TEST(GrPtFaults, NoInputThatIsNotFiniteGivesAPoint) {
             else
                 EXPECT_TRUE((status == 1 || status == 10) && P[0] == 17.3) << bad << " gives " << status;
         };
+        Vec3 none{17.3, 18.3, 19.3};
+        EXPECT_TRUE(std::abs(bad) < 1.0 || (good.gr_pt_at_height(bad, none) != 0 && none[0] == 17.3)) << bad;
         for (const auto member : kMembers) {
             Request look = good;
             look.*member = bad;

@@ -104,7 +104,7 @@ void OrbitModel::take(std::int32_t k) noexcept {
     latest_ = tc_ + kKeepUntil * dt_;
 }
 
-// Deliberate: where t left the run through its early edge, the new one ends a little after t, otherwise it starts
+// Where t left the run through its early edge, the new one ends a little after t, otherwise it starts
 // a little before, so that a sweep in either direction can go on in it for as long as possible.
 void OrbitModel::choose(double t) noexcept {
     const std::int32_t last = runs_count_ - 1;
