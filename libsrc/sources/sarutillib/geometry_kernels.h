@@ -262,7 +262,7 @@ struct ImageTime {
 inline int image_time(const OrbitSegment& orbit, const Vec3& P, double start_s, const TimeSpan& span,
                       double lambda_m, double fd_hz, ImageTime* seen) noexcept {
     const double range_rate = 0.5 * lambda_m * fd_hz;
-    double t = start_s, range2 = 0.0;
+    double t = start_s, range2 = 0.0, slope = 0.0;
     bool settled = false;
     for (int step = 0; step < kInverseSteps && !settled; ++step) {
         if (!(t >= span.first_s && t <= span.last_s)) return QUO_NOT_SEEN;
@@ -270,9 +270,11 @@ inline int image_time(const OrbitSegment& orbit, const Vec3& P, double start_s, 
         const double change = at.value / at.slope;
         t -= change;
         range2 = at.range2_m2;
+        slope = at.slope;
         settled = std::abs(change) < kInverseStep;
     }
-    if (!std::isfinite(t)) return QUO_NOT_SEEN;
+    // A Doppler so large that the slope overflows makes a step of 0, which settles nothing.
+    if (!std::isfinite(t) || !std::isfinite(slope)) return QUO_NOT_SEEN;
     *seen = {t, 2.0 / kLightSpeed * std::sqrt(range2), settled};
     return QUO_OK;
 }
