@@ -247,19 +247,7 @@ TEST(GrPtFaults, NoInputThatIsNotFiniteGivesAPoint) {
     }
 }
 
-TEST(MakeVersor, HasUnitLengthOrIsZero) {
-    double v[3] = {17.3, -4.1, 2.9}, r[3];
-    make_versor(v, r);
-    EXPECT_NEAR(norm({r[0], r[1], r[2]}), 1.0, 1e-15);
-    EXPECT_NEAR(dot({r[0], r[1], r[2]}, {17.3, -4.1, 2.9}), norm({17.3, -4.1, 2.9}), 1e-14);
-    for (const double first : {0.0, kNaN}) {
-        double none[3] = {first, 0.0, 0.0};
-        make_versor(none, none);
-        EXPECT_EQ(none[0] + none[2], 0.0);
-    }
-}
-
-TEST(V1pv2, IsSquareToBothRightHandedAndMayOverwriteAnOperand) {
+TEST(Vectors, AreTurnedIntoVersorsAndMultiplied) {
     const double a[3] = {17.3, -4.1, 2.9};
     double b[3] = {-0.7, 8.3, 5.9}, r[3];
     v1pv2(a, b, r);
@@ -268,6 +256,14 @@ TEST(V1pv2, IsSquareToBothRightHandedAndMayOverwriteAnOperand) {
     EXPECT_NEAR(r[2], 17.3 * 8.3 - 4.1 * 0.7, 1e-12);
     v1pv2(a, b, b);
     EXPECT_TRUE(std::equal(b, b + 3, r));
+    make_versor(a, r);
+    EXPECT_NEAR(norm({r[0], r[1], r[2]}), 1.0, 1e-15);
+    EXPECT_NEAR(dot({r[0], r[1], r[2]}, {17.3, -4.1, 2.9}), norm({17.3, -4.1, 2.9}), 1e-14);
+    for (const double first : {0.0, kNaN}) {
+        double none[3] = {first, 0.0, 0.0};
+        make_versor(none, none);
+        EXPECT_EQ(none[0] + none[2], 0.0);
+    }
 }
 
 }  // namespace
