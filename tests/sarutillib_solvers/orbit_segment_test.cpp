@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 #include <limits>
 #include <vector>
@@ -145,6 +146,9 @@ TEST(InvGrptOpt, RefusesWhatTheSpanDoesNotSee) {
             none.insert(none.end(), {seen(segment(), off, 0.0), seen(broken, P, 0.0)});
         }
     }
+    Trajectory still = segment();  // no motion, no slope
+    for (auto* axis : {&still.x, &still.y, &still.z}) std::fill_n(axis->begin(), 4, 0.0);
+    none.push_back(seen(still, P, 0.0));
     for (const Seen& row : none) EXPECT_TRUE(row.status == 12 && row.t == 17.3 && row.tau == 18.3);
     EXPECT_EQ(report.entries("ERROR").size(), none.size());
     EXPECT_EQ(seen(segment(), P, 0.0, 17.301).status, 0);
