@@ -9,7 +9,6 @@ using quo::CallerFrame;
 using quo::CallFrame;
 using quo::Ellipsoid;
 using quo::OrbitState;
-using quo::RadarLook;
 using quo::Vec3;
 
 constexpr char kSource[] = R"(..\..\..\libsrc\sources\sarutillib\gr_pt)";
