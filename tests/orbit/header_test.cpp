@@ -4,7 +4,6 @@
 #include <cstdint>
 #include <filesystem>
 #include <limits>
-#include <sstream>
 #include <string>
 #include <utility>
 #include <vector>
@@ -21,12 +20,9 @@ namespace {
 
 constexpr test::Times kTimes{803457.3125, 9.75, 6};
 
-/** Every part of the section: its element and its key. */
-constexpr std::pair<const char*, const char*> kParts[] = {{"pSV_m", "pos"},
-                                                          {"vSV_mOs", "vel"},
-                                                          {"t0SV_s", "TimeFirst"},
-                                                          {"dtSV_s", "TimeDelta"},
-                                                          {"nSV_n", "nStateVectors"}};
+/** Every part of the section, as an element and as a key. */
+constexpr const char* kElements[] = {"pSV_m", "vSV_mOs", "t0SV_s", "dtSV_s", "nSV_n"};
+constexpr const char* kKeys[] = {"pos", "vel", "TimeFirst", "TimeDelta", "nStateVectors"};
 
 std::string without(std::string text, const std::string& from, const std::string& to) {
     const auto start = text.find(from);
@@ -42,18 +38,11 @@ protected:
         orbit_.setExactNumbers(true);
         EXPECT_EQ(orbit_.writehdr(folder_.file("out.xml").c_str()), 0);
         header_ = test::read_text(folder_.file("out.xml"));
-        std::ostringstream text;
-        text.precision(17);
-        const auto list = [&](const char* key, const double* values) {
-            text << key << " = {";
-            for (int i = 0; i < 3 * kTimes.count; ++i) text << values[i] << ' ';
-            text << "}\n";
-        };
-        text << "[StateVectorData]\nTimeFirst = " << kTimes.first_s << "\nTimeDelta = " << kTimes.spacing_s
-             << '\n';
-        list("pos", orbit_.pSV_m);
-        list("vel", orbit_.vSV_mOs);
-        parameters_ = text.str() + "nStateVectors = 6\n";
+        for (int i = 0; i < 5; ++i) {
+            parameters_ += std::string{kKeys[i]} + " = {";
+            for (const std::string& value : test::values_of(*orbit_.element(i))) parameters_ += value + " ";
+            parameters_ += "}\n";
+        }
     }
     static void fill(GeneralSAROrbit& orbit) {
         const test::CircularOrbit circle{41.3, 12.8, -12.7};
@@ -76,7 +65,7 @@ protected:
     test::TemporaryFolder folder_;
     int files_ = 0;
     GeneralSAROrbit orbit_;
-    std::string header_, parameters_;
+    std::string header_, parameters_ = "[StateVectorData]\n";
 };
 
 TEST_F(Header, ComesBackFromASectionAndFromAParameterFile) {
@@ -89,16 +78,16 @@ TEST_F(Header, ComesBackFromASectionAndFromAParameterFile) {
         EXPECT_EQ(test::differing_fields(orbit_, record), std::vector<std::string>{});
         const double t = kTimes.at(2) + 0.7;
         EXPECT_EQ(test::norm(test::position_at(orbit_, t) - test::position_at(back, t)), 0.0);
-        for (int i = 0; i < 5; ++i) EXPECT_STREQ(back.element(i)->name, kParts[i].first);
+        for (int i = 0; i < 5; ++i) EXPECT_STREQ(back.element(i)->name, kElements[i]);
     }
 }
 
 TEST_F(Header, MissingPartsGiveFourAndAnEmptyOrbit) {
     const test::Report report;
-    for (const auto& [element, key] : kParts) {
-        const std::string name = element;
+    for (int i = 0; i < 5; ++i) {
+        const std::string name = kElements[i];
         expect_read(QUO_READ_FAILED, file_of(without(header_, "<" + name + ">", "</" + name + ">")));
-        expect_read(QUO_READ_FAILED, file_of(without(parameters_, std::string{key} + " =", "\n")));
+        expect_read(QUO_READ_FAILED, file_of(without(parameters_, std::string{kKeys[i]} + " =", "\n")));
     }
     expect_read(QUO_READ_FAILED, file_of(""));
     expect_read(QUO_READ_FAILED, folder_.file("missing"));
@@ -130,7 +119,7 @@ TEST_F(Header, CountsAreJudgedBeforeTheyCount) {
         SCOPED_TRACE(row.count);
         std::string header = header_, parameters = parameters_;
         header.replace(header.find("<nSV_n>") + 7, 1, std::to_string(row.count));
-        parameters.replace(parameters.find("Vectors = 6") + 10, 1, std::to_string(row.count));
+        parameters.replace(parameters.find("Vectors = {6") + 11, 1, std::to_string(row.count));
         for (const auto& [content, status] : {std::pair{header, row.in_header}, {parameters, row.in_parameters}}) {
             const std::string file = file_of(content);
             expect_read(status, file);
