@@ -52,10 +52,11 @@ QUO_BASE_API void xyz_to_geodetic(const double xyz[3], double a, double b, Geode
  * much longer; so the axes are lengthened by what the point's height then lacks, up to ten times.
  *
  * @param[out] P       ground point; unchanged unless 0 is returned
+ * @param[in]  S, V, tau, fd, lambda, omega, side  as for gr_pt()
  * @param[in]  height  m, above -b
+ * @param[in]  a, b    equatorial and polar semi-axes, m, > 0
  * @return 0, or the status of gr_pt0(), passed on with an ERROR_CALL_TREE entry: 1 also for a height that is not
- *         finite or not above -b, 10 also where the point's height does not settle. The other arguments are those
- * of gr_pt(). */
+ *         finite or not above -b, 10 also where the point's height does not settle. */
 QUO_BASE_API int gr_pt_at_height(double P[3], const double S[3], const double V[3], double tau, double fd,
                                  double lambda, double omega, double side, double height, double a,
                                  double b) QUO_NOEXCEPT;
@@ -72,7 +73,8 @@ inline constexpr double kDegPerRad = 180.0 / std::numbers::pi;
 
 /** A position or direction. */
 struct Vec3 {
-    double x, y, z;  ///< m, for positions
+    /** Earth-fixed; m, for positions. */
+    double x, y, z;
 };
 /** Sum. */
 constexpr Vec3 operator+(const Vec3& a, const Vec3& b) noexcept { return {a.x + b.x, a.y + b.y, a.z + b.z}; }
@@ -103,7 +105,8 @@ constexpr void store(const Vec3& a, double v[3]) noexcept {
 
 /** An ellipsoid about the Earth's centre and axis. */
 struct Ellipsoid {
-    double equatorial_m, polar_m;  ///< semi-axes, m
+    /** Semi-axes, m. */
+    double equatorial_m, polar_m;
 };
 /** The ellipsoid of all geolocation on an orbit. */
 inline constexpr Ellipsoid kWgs84{QUO_WGS84_EQUATORIAL_M, QUO_WGS84_POLAR_M};
