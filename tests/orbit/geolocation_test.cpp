@@ -175,7 +175,9 @@ constexpr Call kCalls[] = {
     {"with height", 4, [](auto& o, auto* in, auto* out) { return o.sat2earth(in[0], in[1], in[2], in[3], out); }},
     {"squinted", 3, [](auto& o, auto* in, auto* p) { return o.sat2earthSquinted(in[0], in[1], in[2], p, p + 3); }},
     {"SVGetGeometry", 3,
-     [](auto& o, auto* in, auto* p) { return o.SVGetGeometry(in[0], in[1], in[2], (GrPtGeometry*)p); }},
+     [](auto& o, auto* in, auto* p) {
+         return o.SVGetGeometry(in[0], in[1], in[2], reinterpret_cast<GrPtGeometry*>(p));
+     }},
     {"linear", 4, [](auto& o, auto* in, auto* out) { return o.earth2satLinear(in, out, out + 1, in[3]); }},
     {"earth2sat", 4, [](auto& o, auto* in, auto* out) { return o.earth2sat(in, out, out + 1, in[3]); }},
     {"earth2satPrecise", 4, [](auto& o, auto* in, auto* p) { return o.earth2satPrecise(in, p, p + 1, in[3]); }},
@@ -252,7 +254,7 @@ TEST(EveryCall, SaysTheSameInAllItsForms) {
     std::vector<double> all(9);
     for (const double fd : {1234.5, 0.0}) {
         all.resize(9);
-        ASSERT_EQ(o.SVGetGeometry(t, range, fd, (GrPtGeometry*)all.data()), 0);
+        ASSERT_EQ(o.SVGetGeometry(t, range, fd, reinterpret_cast<GrPtGeometry*>(all.data())), 0);
         all.insert(all.end(), {all[0], all[1], all[2]});
         EXPECT_EQ(returned(o, t, range, fd), all);
         EXPECT_EQ(written(o, t, range, fd), all);
