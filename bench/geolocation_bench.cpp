@@ -141,6 +141,14 @@ void lat_lon_call(benchmark::State& state) {
     });
 }
 
+void geometry_call(benchmark::State& state) {
+    GrPtGeometry geometry;
+    each_point(state, [&](Bench& s, std::size_t i) {
+        benchmark::DoNotOptimize(s.orbit.SVGetGeometry(s.times[i], s.ranges[i], 0.0, &geometry));
+        benchmark::DoNotOptimize(geometry);
+    });
+}
+
 BENCHMARK(two_frames);
 BENCHMARK(orbit_kernel);
 BENCHMARK(orbit_calls);
@@ -152,6 +160,7 @@ BENCHMARK(inverse_call);
 BENCHMARK(precise_call);
 BENCHMARK(geodetic_kernel);
 BENCHMARK(lat_lon_call);
+BENCHMARK(geometry_call);
 
 }  // namespace
 
@@ -165,5 +174,6 @@ int main(int argc, char** argv) {
                           {"earth2satPrecise / kernel", "precise_call", "inverse_kernel", 2.5},
                           {"earth2satLinear / earth2sat", "linear_call", "inverse_call", 0.5},
                           {"SVGetLatLon / sat2earth", "lat_lon_call", "forward_call", 1.7},
+                          {"SVGetGeometry / sat2earth", "geometry_call", "forward_call", 2.6},
                       });
 }

@@ -53,7 +53,7 @@ void describe_instrument(GeneralSAR& product) {
     SensorAttitude_Obj& attitude = product.sensorAttitude;
     const ROI_Time middle = product.roi.Roi.GetCenter();
     require(product.orbit.SVGetSatSpeed(middle.SlowTime, middle.FastTime, &attitude.Eq_speed) == 0, "no speed");
-    attitude.Eq_distance = middle.FastTime * 299792458.0 / 2.0;
+    attitude.Eq_distance = middle.FastTime * quo::kLightSpeed / 2.0;
     attitude.Mean_DC = 0.0;
     attitude.SquintAngle = 0.0;
     attitude.AntennaLength = 12.3;

@@ -8,8 +8,6 @@
 
 namespace example {
 
-Point Target::position() const { return geodetic_point(latitude_deg, longitude_deg, height_m); }
-
 namespace {
 
 Target parse_target(const std::string& line) {
@@ -17,7 +15,8 @@ Target parse_target(const std::string& line) {
     std::istringstream cells{line};
     char comma[3];
     std::getline(cells, target.name, ',');
-    cells >> target.latitude_deg >> comma[0] >> target.longitude_deg >> comma[1] >> target.height_m >> comma[2] >>
+    GeodeticPoint& place = target.place;
+    cells >> place.latitude_deg >> comma[0] >> place.longitude_deg >> comma[1] >> place.height_m >> comma[2] >>
         target.strength;
     const bool separated = comma[0] == ',' && comma[1] == ',' && comma[2] == ',';
     if (cells.fail() || !separated) throw Failure{"\"" + line + "\": no target"};

@@ -4,18 +4,15 @@
 #include <string>
 #include <vector>
 
-#include "geometry.h"
+#include "quo_base/geometry.h"
 
 namespace example {
 
 /** A point target: a reflector that gives back an echo of the same strength from every direction. */
 struct Target {
     std::string name;
-    double latitude_deg, longitude_deg;  // geodetic, WGS84
-    double height_m;                     // above the ellipsoid
-    double strength;                     // amplitude of its echo
-
-    [[nodiscard]] Point position() const;
+    GeodeticPoint place;  // on WGS84
+    double strength;      // amplitude of its echo
 };
 
 /** Reads targets from a table of comma-separated values with the columns name, latitude_deg, longitude_deg,

@@ -21,7 +21,7 @@ constexpr int kLinesInBlock = 256;
 
 /** A target as the sensor sees it. */
 struct Sight {
-    Point position;
+    quo::Vec3 position;
     double strength;
     double doppler_hz;             // at the centre of the beam
     double first_s, last_s;        // times at which the target enters and leaves the beam
@@ -52,7 +52,7 @@ void set_sampling(const EchoJob& job, GeneralSAR& product) {
     sampling.Baz_hz = given_or(job.beam_bandwidth_hz, given_or(sampling.Baz_hz, 0.8 * sampling.prf_hz));
     sampling.pri_s = 1.0 / sampling.prf_hz;
     sampling.Trg_s = 1.0 / sampling.frg_hz;
-    sampling.fc_hz = kLightSpeed / sampling.lambda_m;
+    sampling.fc_hz = quo::kLightSpeed / sampling.lambda_m;
     product.pulse.PulseLength = job.pulse_s;
     product.pulse.Bandwidth = sampling.Brg_hz;
     product.pulse.PulseKRate = sampling.Brg_hz / job.pulse_s;
@@ -60,13 +60,15 @@ void set_sampling(const EchoJob& job, GeneralSAR& product) {
 }
 
 Sight see(const Target& target, const polyDC* centroid, double beam_hz, GeneralSAROrbit& orbit) {
-    Sight sight{target.position(), target.strength, 0.0, 0.0, 0.0, 0.0, 0.0};
+    Sight sight{quo::from_geodetic(target.place), target.strength, 0.0, 0.0, 0.0, 0.0, 0.0};
+    double xyz[3];
+    quo::store(sight.position, xyz);
     double zero_doppler_s = 0.0, tau_s = 0.0;
-    require(orbit.earth2sat(sight.position.data(), &zero_doppler_s, &tau_s), target.name + " is not seen");
+    require(orbit.earth2sat(xyz, &zero_doppler_s, &tau_s), target.name + " is not seen");
     if (centroid != nullptr) centroid->EvaluatePoly(tau_s, zero_doppler_s, &sight.doppler_hz);
     sight.nearest_s = sight.farthest_s = tau_s;
     const auto edge = [&](double doppler_hz, double& azimuth_s) {
-        require(orbit.earth2sat(sight.position.data(), &azimuth_s, &tau_s, doppler_hz),
+        require(orbit.earth2sat(xyz, &azimuth_s, &tau_s, doppler_hz),
                 target.name + " is not seen with a Doppler of " + std::to_string(doppler_hz) + " Hz");
         sight.farthest_s = std::max(sight.farthest_s, tau_s);
     };
@@ -160,16 +162,16 @@ void add_echo(fcomplex* line, int samples, double delay, double strength, double
 
 /** Fills one line with the echoes that arrive in it. */
 void fill_line(fcomplex* line, double azimuth_s, const std::vector<Sight>& sights, GeneralSAR& product) {
-    Point platform, velocity;
-    require(product.orbit.SVGetPos(azimuth_s, platform.data()), "the orbit's position");
-    require(product.orbit.SVGetVel(azimuth_s, velocity.data()), "the orbit's velocity");
+    double platform[3], velocity[3];
+    require(product.orbit.SVGetPos(azimuth_s, platform), "the orbit's position");
+    require(product.orbit.SVGetVel(azimuth_s, velocity), "the orbit's velocity");
     const SamplingConstants_Obj& sampling = product.samplingConstants;
     for (const Sight& sight : sights) {
-        const Point sightline = sight.position - platform;
-        const double range_m = length(sightline);
-        const double doppler_hz = 2.0 / sampling.lambda_m * dot(velocity, sightline) / range_m;
+        const quo::Vec3 sightline = sight.position - quo::load(platform);
+        const double range_m = norm(sightline);
+        const double doppler_hz = 2.0 / sampling.lambda_m * dot(quo::load(velocity), sightline) / range_m;
         if (std::abs(doppler_hz - sight.doppler_hz) > 0.5 * sampling.Baz_hz) continue;
-        const double delay = (2.0 * range_m / kLightSpeed - product.roi.Roi.FastStartTime) * sampling.frg_hz;
+        const double delay = (2.0 * range_m / quo::kLightSpeed - product.roi.Roi.FastStartTime) * sampling.frg_hz;
         add_echo(line, product.roi.Roi.Samples, delay, sight.strength, -4.0 * kPi * range_m / sampling.lambda_m,
                  product.pulse);
     }

@@ -137,9 +137,10 @@ Finder::Finder(const std::string& image) {
 Measurement Finder::find(const Target& target) {
     const ROI_Obj& roi = product_.roi.Roi;
     const SamplingConstants_Obj& sampling = product_.samplingConstants;
-    const Point point = target.position();
+    double place[3], located[3];
+    geodetic_to_xyz(&target.place, QUO_WGS84_EQUATORIAL_M, QUO_WGS84_POLAR_M, place);
     double azimuth_s = 0.0, range_s = 0.0, doppler_hz = 0.0;
-    require(product_.orbit.earth2sat(point.data(), &azimuth_s, &range_s), target.name + " is not seen");
+    require(product_.orbit.earth2sat(place, &azimuth_s, &range_s), target.name + " is not seen");
     require(product_.polynomials.EvaluateDC(range_s, azimuth_s, &doppler_hz), "the Doppler centroid");
     const double line = (azimuth_s - roi.SlowStartTime) / roi.SlowTimeDelta;
     const double sample = (range_s - roi.FastStartTime) / roi.FastTimeDelta;
@@ -165,15 +166,18 @@ Measurement Finder::find(const Target& target) {
     found.name = target.name;
     found.azimuth = respond(along, peak_line - line, 0.886 * sampling.prf_hz / sampling.Baz_hz);
     found.range = respond(across, peak_sample - sample, 0.886 * sampling.frg_hz / sampling.Brg_hz);
-    const Point located = ground_point(product_.orbit, roi.SlowStartTime + peak_line * roi.SlowTimeDelta,
-                                       roi.FastStartTime + peak_sample * roi.FastTimeDelta, target.height_m);
-    found.ground_m = length(located - point);
+    require(product_.orbit.sat2earth(roi.SlowStartTime + peak_line * roi.SlowTimeDelta,
+                                     roi.FastStartTime + peak_sample * roi.FastTimeDelta, 0.0,
+                                     target.place.height_m, located),
+            "a ground point");
+    found.ground_m = norm(quo::load(located) - quo::load(place));
     found.strength_db = 20.0 * std::log10(top / target.strength);
     // The centroid's ramp is put on again at the peak; between the fine places the phase hardly changes without
     // it.
     const double phase = static_cast<double>(std::arg(chip.at(row, column))) +
                          2.0 * kPi * doppler_hz * roi.SlowTimeDelta * chip_line;
-    found.phase_rad = std::remainder(phase + 2.0 * kPi * range_s * kLightSpeed / sampling.lambda_m, 2.0 * kPi);
+    found.phase_rad =
+        std::remainder(phase + 2.0 * kPi * range_s * quo::kLightSpeed / sampling.lambda_m, 2.0 * kPi);
     return found;
 }
 

@@ -4,7 +4,6 @@
 #include <cmath>
 #include <numbers>
 
-#include "../common/geometry.h"
 #include "filters.h"
 
 namespace example {
@@ -53,7 +52,8 @@ Reach reach_of(GeneralSAR& product, const ROI_Obj& data, const DopplerBand& band
             const double doppler_hz = centre_hz + side * band.width_hz;
             reach.first_s = std::min(reach.first_s, history.time_s(doppler_hz));
             reach.last_s = std::max(reach.last_s, history.time_s(doppler_hz));
-            reach.migration_s = std::max(reach.migration_s, 2.0 * history.migration_m(doppler_hz) / kLightSpeed);
+            reach.migration_s =
+                std::max(reach.migration_s, 2.0 * history.migration_m(doppler_hz) / quo::kLightSpeed);
             reach.steepest = std::max(reach.steepest, history.migration_m(doppler_hz) / history.range_m);
         }
     }
@@ -139,8 +139,9 @@ double AzimuthFocusing::doppler_hz(int bin) const {
 RowPhase AzimuthFocusing::middle_phase(double doppler_hz) const {
     const double d = middle_.cosine(doppler_hz);
     const double step_hz = 1.0 / (range_step_s_ * block_.samples());
-    const double phase_per_hz = 4.0 * kPi * middle_.range_m / kLightSpeed;
-    const double dispersion = -0.5 * phase_per_hz * (1.0 - d * d) * middle_.lambda_m / (kLightSpeed * d * d * d);
+    const double phase_per_hz = 4.0 * kPi * middle_.range_m / quo::kLightSpeed;
+    const double dispersion =
+        -0.5 * phase_per_hz * (1.0 - d * d) * middle_.lambda_m / (quo::kLightSpeed * d * d * d);
     return {kPi / 4.0 - middle_.phase_rad(doppler_hz) - miss_.at(doppler_hz),
             phase_per_hz * (1.0 / d - 1.0) * step_hz, dispersion * step_hz * step_hz};
 }

@@ -6,7 +6,6 @@
 #include <filesystem>
 #include <optional>
 
-#include "../common/geometry.h"
 #include "../common/product.h"
 #include "../common/progress.h"
 #include "azimuth_focusing.h"

@@ -3,7 +3,6 @@
 #include <cmath>
 #include <numbers>
 
-#include "../common/geometry.h"
 #include "../common/session.h"
 #include "quo_base/MatrixAlgebraANSI.h"
 
@@ -38,7 +37,7 @@ RangeHistories::RangeHistories(GeneralSAR& product, const ROI_Obj& region, doubl
 }
 
 Hyperbola RangeHistories::at(double range_s) const {
-    const double range_m = 0.5 * kLightSpeed * range_s, lambda_m = product_.orbit.getLambda();
+    const double range_m = 0.5 * quo::kLightSpeed * range_s, lambda_m = product_.orbit.getLambda();
     double rate_hz_s = 0.0;
     fm_rate_.EvaluatePoly(range_s, middle_s_, &rate_hz_s);
     return {range_m, -0.5 * rate_hz_s * lambda_m * range_m, lambda_m};
@@ -48,7 +47,8 @@ RangeHistories::PhasePolynomial RangeHistories::miss(double range_s, double cent
     constexpr int kFrequencies = 9;
     constexpr double kTurn = 2.0 * std::numbers::pi;
     GeneralSAROrbit& orbit = product_.orbit;
-    const Point target = ground_point(orbit, middle_s_, range_s, height_m_);
+    double target[3], platform[3];
+    require(orbit.sat2earth(middle_s_, range_s, 0.0, height_m_, target), "a ground point");
     const Hyperbola hyperbola = at(range_s);
     PhasePolynomial missing{centre_hz, 0.5 * band_hz, {}};
     double x[kFrequencies], phase[kFrequencies];
@@ -56,9 +56,10 @@ RangeHistories::PhasePolynomial RangeHistories::miss(double range_s, double cent
         x[i] = 2.0 * i / (kFrequencies - 1) - 1.0;
         const double doppler_hz = centre_hz + x[i] * missing.half_band_hz;
         double azimuth_s = 0.0, unused = 0.0;
-        require(orbit.earth2sat(target.data(), &azimuth_s, &unused, doppler_hz), "the history of a target");
-        const double cycles =
-            2.0 * distance(orbit, azimuth_s, target) / hyperbola.lambda_m + doppler_hz * (azimuth_s - middle_s_);
+        require(orbit.earth2sat(target, &azimuth_s, &unused, doppler_hz), "the history of a target");
+        require(orbit.SVGetPos(azimuth_s, platform), "the orbit's position");
+        const double distance_m = norm(quo::load(target) - quo::load(platform));
+        const double cycles = 2.0 * distance_m / hyperbola.lambda_m + doppler_hz * (azimuth_s - middle_s_);
         const double turns = cycles - 2.0 * hyperbola.range_m / hyperbola.lambda_m;
         phase[i] = -kTurn * turns - hyperbola.phase_rad(doppler_hz);
     }

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "quo_base/api.h"
+#include "quo_base/geometry.h"
 #include "quo_base/quorelxml_v2.h"
 
 /** @file
@@ -225,8 +226,11 @@ public:
     /** Ground point seen at time t; Doppler 0 unless given. */
     int sat2earth(double t, double range, double* xyz) noexcept;
     int sat2earth(double t, double range, double doppler, double* xyz) noexcept;
-    /** The same into the orbit's result point, which holds until the next such call; three not-a-numbers after a
-     * failure. */
+    /** The same at a geodetic height, m, as gr_pt_at_height() finds it; height 0 gives the bits of the form above.
+     */
+    int sat2earth(double t, double range, double doppler, double height, double* xyz) noexcept;
+    /** The point on the ellipsoid into the orbit's result point, which holds until the next such call; three
+     * not-a-numbers after a failure. */
     double* sat2earth(const double pos[3], const double vel[3], double range) noexcept;
     double* sat2earth(double t, double range) noexcept;
     double* sat2earth(double t, double range, double doppler) noexcept;
@@ -261,11 +265,13 @@ public:
     int earth2satLinear(const double xyz[3], double* t, double* rangeTime) noexcept;
     int earth2satLinear(const double xyz[3], double* t, double* rangeTime, double doppler) noexcept;
     /** Time and range time at which the point is seen: first guess, then Newton's method on the run of five that
-     * serves that time, to 1e-8 s. Where that leads nowhere, the search goes on from the other first guess over
-     * the whole orbit, from the state vector nearest to the point, and last wherever the Doppler equation changes
-     * sign from vector to vector; of several such times the one seen from nearest is taken, and Newton's method
-     * ends on the run that serves it. On an orbit so long that straight flight is no guess (four fifths of a
-     * revolution) the nearest vector comes first, so that the nearest pass is found.
+     * serves that time, to 1e-8 s. Where the solution lies outside the middle of that run, it is found once more
+     * on the run that serves there, so that sat2earth() at that time starts from the same curve. Where the first
+     * guess leads nowhere, the search goes on from the other first guess over the whole orbit, from the state
+     * vector nearest to the point, and last wherever the Doppler equation changes sign from vector to vector; of
+     * several such times the one seen from nearest is taken, and Newton's method ends on the run that serves it.
+     * On an orbit so long that straight flight is no guess (four fifths of a revolution) the nearest vector comes
+     * first, so that the nearest pass is found.
      *
      * Range and Doppler are all that is asked: neither the look side nor the horizon plays a part. A point to the
      * left of a platform that looks right is found, and so is one that the Earth hides.
@@ -276,8 +282,9 @@ public:
      * @return 0; 1 without a model, with both outputs -1.0; 12. */
     int earth2sat(const double xyz[3], double* t, double* rangeTime) noexcept;
     int earth2sat(const double xyz[3], double* t, double* rangeTime, double doppler) noexcept;
-    /** As earth2sat(), with the first guess found on the coarse polynomial through the whole orbit, up to half a
-     * revolution. */
+    /** As earth2sat(), with the first guess found on the coarse polynomial through the whole orbit. Where the
+     * orbit is longer than 3 rad of its circle, that polynomial leads to the far side of the Earth: it is left out
+     * then, and the search begins where earth2sat() goes when its first guess leads nowhere. */
     int earth2satPrecise(const double xyz[3], double* t, double* rangeTime) noexcept;
     int earth2satPrecise(const double xyz[3], double* t, double* rangeTime, double doppler) noexcept;
     /** One output of earth2sat(): -1.0 without a model, not-a-number after another failure. */
@@ -288,8 +295,13 @@ public:
 
     // --- geometry of a sample --------------------------------------------------------------------
     //
-    // Of the ground point that sat2earth() finds. The short forms return not-a-number after a failure.
+    // Of the ground point that sat2earth() finds. The short forms return not-a-number after a failure. All of it
+    // comes from one solution of the point: who asks for more than one part gets them at once from
+    // SVGetGeometry().
 
+    /** The whole geometry of a sample, with the bits that the calls below give. `geometry` is unchanged on
+     * failure. */
+    int SVGetGeometry(double t, double range, double doppler, GrPtGeometry* geometry) noexcept;
     /** Geodetic latitude, and longitude from -180 to 180. */
     int SVGetLatLon(double t, double range, double doppler, double* latitude, double* longitude) noexcept;
     int SVGetLatLon(double t, double range, double* latitude, double* longitude) noexcept;
@@ -324,7 +336,7 @@ public:
      * SouthEast receive P3, P4, P1 and P2 on an ascending orbit, else P2, P1, P4 and P3: right for a platform that
      * looks to the right. The points are made in the order P1 to P4, Center; a failure leaves those before it
      * filled.
-     * @return 0; 1 for null; or the status of SVGetLatLon() or SVGetAngles() */
+     * @return 0; 1 for null; or the status of SVGetGeometry() */
     int SVGetGeoCoords(geoCoords_Obj* grid, const GSRoi_Obj* roi) noexcept;
 
     // --- polynomials derived from the orbit ------------------------------------------------------
@@ -392,8 +404,12 @@ protected:
 
 private:
     bool modelReady() const noexcept;
+    int platformAt(quo::CallerFrame frame, double t, quo::OrbitSample* sample) noexcept;
     int sampleAt(quo::CallerFrame frame, double t, double range, double doppler,
                  quo::OrbitSample* sample) noexcept;
+    template <typename Read>
+    int readSample(const char* getter, bool writable, double t, double range, double doppler,
+                   const Read& read) noexcept;
     int locate(quo::CallerFrame frame, const double xyz[3], double doppler, bool precise, double* t,
                double* rangeTime) noexcept;
 

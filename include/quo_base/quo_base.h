@@ -11,6 +11,7 @@
 #include "quo_base/debugIO.h"
 #include "quo_base/fft.h"
 #include "quo_base/gen_utils.h"
+#include "quo_base/geometry.h"
 #include "quo_base/gr_pt.h"
 #include "quo_base/interp_orb.h"
 #include "quo_base/profile.h"

@@ -64,7 +64,7 @@ std::vector<Target> nine_targets(const Acquisition& row, const std::string& scen
             Target target{"target " + std::to_string(targets.size()), 0.0, 0.0, line == 0 ? row.height_m : 0.0,
                           300.0 + 17.3 * sample};
             EXPECT_EQ(orbit.SVGetLatLon(row.azimuth_s + line * line_s, row.range_s + sample * sample_s,
-                                        &target.latitude_deg, &target.longitude_deg),
+                                        &target.place.latitude_deg, &target.place.longitude_deg),
                       0);
             targets.push_back(target);
         }

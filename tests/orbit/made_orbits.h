@@ -16,10 +16,9 @@ class EllipticOrbit {
 public:
     EllipticOrbit(double latitude_deg, double longitude_deg, double heading_deg, double eccentricity)
         : eccentricity_{eccentricity} {
-        const LocalFrame at = local_frame(latitude_deg, longitude_deg);
-        const double heading = heading_deg * kRadPerDeg;
-        outward_ = at.up;
-        along_ = std::sin(heading) * at.east + std::cos(heading) * at.north;
+        const Platform perigee = CircularOrbit{latitude_deg, longitude_deg, heading_deg}.inertial(0.0);
+        outward_ = unit(perigee.position);
+        along_ = unit(perigee.velocity);
     }
     [[nodiscard]] Platform earth_fixed(double t) const { return to_earth_fixed(inertial(t), t); }
 

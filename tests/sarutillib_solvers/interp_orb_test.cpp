@@ -40,20 +40,14 @@ TEST(OrbitPolynomial, ValueAndDerivativesAreThoseOfAShiftedPower) {
         EXPECT_NEAR(ACCMACRO(u, c.data(), power + 1), p * (p - 1) * term(p - 2), 1e-12 * term(p));
         EXPECT_EQ(POSMACRO(0.0, c.data(), power + 1), c.back());
     }
-}
-
-TEST(OrbitPolynomial, OfNoCoefficientsIsZeroAndReadsNothing) {
     for (const auto macro : {POSMACRO, VELMACRO, ACCMACRO}) EXPECT_EQ(macro(17.3, nullptr, 0), 0.0);
-}
-
-TEST(OrbitPolynomial, OfThreeAxesIsThatOfEach) {
     const std::vector<double> c[3] = {shifted_power(0.6, 4), shifted_power(-1.1, 4), shifted_power(2.3, 4)};
     double state[3][3];
-    POSVELACC_5(1.7, c[0].data(), c[1].data(), c[2].data(), state[0], state[1], state[2]);
+    POSVELACC_5(u, c[0].data(), c[1].data(), c[2].data(), state[0], state[1], state[2]);
     for (std::size_t axis = 0; axis < 3; ++axis) {
-        EXPECT_NEAR(state[0][axis], POSMACRO(1.7, c[axis].data(), 5), 1e-12);
-        EXPECT_NEAR(state[1][axis], VELMACRO(1.7, c[axis].data(), 5), 1e-12);
-        EXPECT_NEAR(state[2][axis], ACCMACRO(1.7, c[axis].data(), 5), 1e-12);
+        EXPECT_NEAR(state[0][axis], POSMACRO(u, c[axis].data(), 5), 1e-12);
+        EXPECT_NEAR(state[1][axis], VELMACRO(u, c[axis].data(), 5), 1e-12);
+        EXPECT_NEAR(state[2][axis], ACCMACRO(u, c[axis].data(), 5), 1e-12);
     }
 }
 
@@ -68,16 +62,11 @@ struct Pass {
 TEST(OrbInterp, PassesThroughTheVectorsAndFollowsTheOrbitBetween) {
     const CircularOrbit orbit{77.3, 12.8, -12.7};
     const Pass kPasses[] = {
-        {5, 0.0, 10.0, false, 4e-9, 3e-5},
         {5, -13.7, 10.0, true, 4e-9, 3e-5},
-        {9, 0.0, 10.0, false, 4e-9, 1e-7},
         {9, 7.3, 60.0, false, 4e-9, 1e-5},
-        {17, 0.0, 10.0, false, 4e-9, 1e-6},
         {17, 0.0, 10.0, true, 4e-9, 3e-4},
-        {17, 0.0, 1.0, false, 4e-9, 1e-6},
         {31, 0.0, 10.0, false, 2e-8, 1e-6},
         // Here the one polynomial through all vectors would miss them by metres once it is evaluated.
-        {31, 0.0, 10.0, true, 2e-6, 1e-4},
         {31, 0.0, 60.0, true, 2e-6, 1e-4},
         {97, 0.0, 10.0, true, 2e-6, 1e-4},
     };
@@ -115,21 +104,16 @@ TEST(OrbInterp, FindsTheCoefficientsOfAPolynomial) {
 }
 
 TEST(OrbInterp, RefusesWhatItCannotFit) {
-    const double nan = std::numeric_limits<double>::quiet_NaN(),
-                 infinity = std::numeric_limits<double>::infinity();
-    const std::vector<double> good{41.3, 12.8, -12.7, 43.1, 11.9, -13.1, 45.7, 10.3, -13.9};
+    const double nan = std::nan("");
     struct Refused {
         double t0, dt, last;
         int n, status;
         std::size_t entries;  // in the call tree: the fit of an axis was reached
     };
-    for (const Refused& row : {Refused{0.0, 10.0, -13.9, 0, 1, 0}, Refused{0.0, 10.0, -13.9, -3, 1, 0},
-                               Refused{0.0, 0.0, -13.9, 3, 1, 1}, Refused{0.0, nan, -13.9, 3, 1, 1},
-                               Refused{infinity, 10.0, -13.9, 3, 1, 1}, Refused{0.0, 10.0, nan, 3, 10, 1},
-                               Refused{0.0, 10.0, -infinity, 3, 10, 1}}) {
+    for (const Refused& row : {Refused{0.0, 10.0, -13.9, -3, 1, 0}, Refused{0.0, 0.0, -13.9, 3, 1, 1},
+                               Refused{nan, 10.0, -13.9, 3, 1, 1}, Refused{0.0, 10.0, nan, 3, 10, 1}}) {
         const test::Report report;
-        std::vector<double> positions = good;
-        positions.back() = row.last;
+        const std::vector<double> positions{41.3, 12.8, -12.7, 43.1, 11.9, -13.1, 45.7, 10.3, row.last};
         double c[3][3] = {{17.3}, {17.3}, {17.3}};
         EXPECT_EQ(orb_interp(row.t0, row.dt, positions.data(), nullptr, row.n, c[0], c[1], c[2]), row.status);
         EXPECT_EQ(c[0][0] + c[1][0] + c[2][0], 3 * 17.3);
@@ -138,9 +122,6 @@ TEST(OrbInterp, RefusesWhatItCannotFit) {
         ASSERT_EQ(tree.size(), row.entries);
         for (const auto& entry : tree) EXPECT_EQ(entry.function, "orb_interp");
     }
-}
-
-TEST(OrbInterp, SurvivesEveryFailedAllocation) {
     const test::Report report;
     const std::vector<double> positions(15, 17.3);
     test::fail_every_allocation([&] { return Trajectory{0.0, 10.0, positions}.status; });
@@ -150,9 +131,9 @@ TEST(OrbInterp, SurvivesEveryFailedAllocation) {
 TEST(Orbffit, GivesFiniteCoefficientsForAnyFiniteValues) {
     constexpr int kCount = 3001;
     const double most = std::numeric_limits<double>::max();
-    for (const double size : {0.0, 5e-324, 1.7e-3, 1e300, most})
+    for (const double size : {0.0, 5e-324, 1.7e-3, most})
         for (const double sign : {+1.0, -1.0})
-            for (const double dt : {1e-300, -10.0, 60.0, 1e300}) {
+            for (const double dt : {1e-300, -10.0, 1e300}) {
                 SCOPED_TRACE(testing::Message() << size << " sign " << sign << " dt " << dt);
                 std::vector<double> values(kCount, size), c(kCount, std::numeric_limits<double>::quiet_NaN());
                 for (std::size_t i = 1; i < values.size(); i += 2) values[i] = sign * size;

@@ -5,6 +5,7 @@
 #include "diagnosticslib/call_frame.h"
 #include "generalSAR/orbit_model.h"
 #include "quo_base/generalSARorbit.h"
+#include "quo_base/geo_grid.h"
 
 namespace quo {
 
@@ -13,6 +14,8 @@ struct OrbitSample {
     OrbitSegment curve;
     double since_run_start_s;
     Vec3 position, velocity, point;
+
+    [[nodiscard]] OrbitState state() const noexcept { return orbit_state(curve, since_run_start_s); }
 };
 
 }  // namespace quo
@@ -77,19 +80,50 @@ double distance_to_ellipsoid(const quo::Vec3& S, const quo::Vec3& u, const quo::
     return (-us - std::sqrt(us * us - uu * ss)) / uu;
 }
 
+/** Fills a ground point from the sample at an azimuth and a range time. */
+int fill_point(Obj& orbit, double azimuth, double range, geopoint& point) noexcept {
+    GrPtGeometry at;
+    if (const int status = orbit.SVGetGeometry(azimuth, range, 0.0, &at)) return status;
+    const double values[] = {at.latitude_deg, at.longitude_deg, 0.0, at.incidence_deg, at.look_deg};
+    std::ranges::copy(values, point.Point);
+    point.Latitude = at.latitude_deg;
+    point.Longitude = at.longitude_deg;
+    point.Height = 0.0;
+    point.IncidenceAngle = at.incidence_deg;
+    point.LookAngle = at.look_deg;
+    return QUO_OK;
+}
+
 }  // namespace
 
-int Obj::sampleAt(quo::CallerFrame frame, double t, double range, double doppler,
-                  quo::OrbitSample* sample) noexcept {
+int Obj::platformAt(quo::CallerFrame frame, double t, quo::OrbitSample* sample) noexcept {
     if (!modelReady()) return frame.fail(QUO_REFUSED, kNoModel);
     if (!std::isfinite(t)) return frame.fail(QUO_REFUSED, kBadArgument);
     sample->curve = model_->select(t).curve();
     const double u = sample->since_run_start_s = t - model_->reference();
     sample->position = orbit_position(sample->curve, u);
     sample->velocity = orbit_velocity(sample->curve, u);
+    return QUO_OK;
+}
+
+int Obj::sampleAt(quo::CallerFrame frame, double t, double range, double doppler,
+                  quo::OrbitSample* sample) noexcept {
+    if (const int status = platformAt(frame, t, sample)) return status;
     const quo::RadarLook look{range, doppler, lambda_, static_cast<double>(look_sign_)};
     const int status = ground_point(sample->position, sample->velocity, look, quo::kWgs84, &sample->point);
     return status ? frame.callee(status) : QUO_OK;
+}
+
+/** Solves a sample under the getter's own name, and lets `read` take from it what was asked for. */
+template <typename Read>
+int Obj::readSample(const char* getter, bool writable, double t, double range, double doppler,
+                    const Read& read) noexcept {
+    quo::CallFrame frame{getter, kSource};
+    if (!writable) return frame.fail(QUO_REFUSED, kBadArgument);
+    quo::OrbitSample sample;
+    if (const int status = sampleAt(frame, t, range, doppler, &sample)) return status;
+    read(sample);
+    return frame.success();
 }
 
 // --- from a sample to the ground --------------------------------------------------------------------------------
@@ -108,10 +142,19 @@ int Obj::sat2earth(const double pos[3], const double vel[3], double range, doubl
 int Obj::sat2earth(double t, double range, double* xyz) noexcept { return sat2earth(t, range, 0.0, xyz); }
 
 int Obj::sat2earth(double t, double range, double doppler, double* xyz) noexcept {
+    return readSample("GeneralSAROrbit::sat2earth", xyz, t, range, doppler,
+                      [xyz](const quo::OrbitSample& sample) { quo::store(sample.point, xyz); });
+}
+
+int Obj::sat2earth(double t, double range, double doppler, double height, double* xyz) noexcept {
     quo::CallFrame frame{"GeneralSAROrbit::sat2earth", kSource};
     if (!xyz) return frame.fail(QUO_REFUSED, kBadArgument);
     quo::OrbitSample sample;
-    if (const int status = sampleAt(frame, t, range, doppler, &sample)) return status;
+    if (const int status = platformAt(frame, t, &sample)) return status;
+    const quo::RadarLook look{range, doppler, lambda_, static_cast<double>(look_sign_)};
+    if (const int status = ground_point_at_height(sample.position, sample.velocity, look, 0.0, height, quo::kWgs84,
+                                                  &sample.point))
+        return frame.callee(status);
     quo::store(sample.point, xyz);
     return frame.success();
 }
@@ -236,44 +279,41 @@ double Obj::earth2satAzimuth(double x, double y, double z) noexcept {
 
 // --- geometry of a sample ---------------------------------------------------------------------------------------
 
+int Obj::SVGetGeometry(double t, double range, double doppler, GrPtGeometry* geometry) noexcept {
+    return readSample(
+        "GeneralSAROrbit::SVGetGeometry", geometry, t, range, doppler, [&](const quo::OrbitSample& sample) {
+            *geometry = quo::sample_geometry(sample.state(), sample.point, lambda_, 0.0, quo::kWgs84);
+        });
+}
+
+// A single part costs a fraction of the whole: each getter works out its own alone.
+
 int Obj::SVGetLatLon(double t, double range, double doppler, double* latitude, double* longitude) noexcept {
-    quo::CallFrame frame{"GeneralSAROrbit::SVGetLatLon", kSource};
-    if (!latitude || !longitude) return frame.fail(QUO_REFUSED, kBadArgument);
-    quo::OrbitSample sample;
-    if (const int status = sampleAt(frame, t, range, doppler, &sample)) return status;
-    const quo::Geodetic place = to_geodetic(sample.point, quo::kWgs84);
-    *latitude = place.latitude_deg;
-    *longitude = place.longitude_deg;
-    return frame.success();
+    return readSample("GeneralSAROrbit::SVGetLatLon", latitude && longitude, t, range, doppler,
+                      [&](const quo::OrbitSample& sample) {
+                          const GeodeticPoint place = to_geodetic(sample.point, quo::kWgs84);
+                          *latitude = place.latitude_deg;
+                          *longitude = place.longitude_deg;
+                      });
 }
 
 int Obj::SVGetAngles(double t, double range, double doppler, double* incidence, double* look) noexcept {
-    quo::CallFrame frame{"GeneralSAROrbit::SVGetAngles", kSource};
-    if (!incidence || !look) return frame.fail(QUO_REFUSED, kBadArgument);
-    quo::OrbitSample sample;
-    if (const int status = sampleAt(frame, t, range, doppler, &sample)) return status;
-    *incidence = quo::incidence_deg(sample.position, sample.point, quo::kWgs84);
-    *look = quo::look_angle_deg(sample.position, sample.point);
-    return frame.success();
+    return readSample("GeneralSAROrbit::SVGetAngles", incidence && look, t, range, doppler,
+                      [&](const quo::OrbitSample& sample) {
+                          *incidence = quo::incidence_deg(sample.position, sample.point, quo::kWgs84);
+                          *look = quo::look_angle_deg(sample.position, sample.point);
+                      });
 }
 
 int Obj::SVGetFR(double t, double range, double doppler, double* rate) noexcept {
-    quo::CallFrame frame{"GeneralSAROrbit::SVGetFR", kSource};
-    if (!rate) return frame.fail(QUO_REFUSED, kBadArgument);
-    quo::OrbitSample sample;
-    if (const int status = sampleAt(frame, t, range, doppler, &sample)) return status;
-    const quo::OrbitState state = orbit_state(sample.curve, sample.since_run_start_s);
-    *rate = quo::fm_rate_hz_s(state, sample.point, lambda_, 0.0);
-    return frame.success();
+    return readSample("GeneralSAROrbit::SVGetFR", rate, t, range, doppler, [&](const quo::OrbitSample& sample) {
+        *rate = quo::fm_rate_hz_s(sample.state(), sample.point, lambda_, 0.0);
+    });
 }
 
 int Obj::SVGetSatSpeed(double t, double range, double doppler, double* speed) noexcept {
-    quo::CallFrame frame{"GeneralSAROrbit::SVGetSatSpeed", kSource};
-    if (!speed) return frame.fail(QUO_REFUSED, kBadArgument);
-    quo::OrbitSample sample;
-    if (const int status = sampleAt(frame, t, range, doppler, &sample)) return status;
-    *speed = norm(sample.velocity);
-    return frame.success();
+    return readSample("GeneralSAROrbit::SVGetSatSpeed", speed, t, range, doppler,
+                      [&](const quo::OrbitSample& sample) { *speed = norm(sample.velocity); });
 }
 
 int Obj::SVGetLatLon(double t, double range, double* latitude, double* longitude) noexcept {
@@ -323,3 +363,24 @@ double Obj::SVGetSatSpeed(double t, double range, double doppler) noexcept {
     return speed;
 }
 double Obj::SVGetSatSpeed(double t, double range) noexcept { return SVGetSatSpeed(t, range, 0.0); }
+
+int Obj::SVGetGeoCoords(geoCoords_Obj* grid, const GSRoi_Obj* roi) noexcept {
+    quo::CallFrame frame{"GeneralSAROrbit::SVGetGeoCoords", kSource};
+    if (!grid || !roi) return frame.fail(QUO_REFUSED, "An argument is null");
+    const ROI_Obj& region = roi->Roi;
+    const bool up = isAscending();
+    const struct {
+        double along, across;  // parts of the region's lengths
+        geopoint& point;
+    } points[] = {{0.0, 0.0, up ? grid->SouthWest : grid->NorthEast},
+                  {0.0, 1.0, up ? grid->SouthEast : grid->NorthWest},
+                  {1.0, 0.0, up ? grid->NorthWest : grid->SouthEast},
+                  {1.0, 1.0, up ? grid->NorthEast : grid->SouthWest},
+                  {0.5, 0.5, grid->Center}};
+    for (const auto& [along, across, point] : points) {
+        const double azimuth = region.SlowStartTime + along * region.SlowTimeLength;
+        const double range = region.FastStartTime + across * region.FastTimeLength;
+        if (const int status = fill_point(*this, azimuth, range, point)) return frame.callee(status);
+    }
+    return frame.success();
+}

@@ -1,6 +1,6 @@
 #include "sarutillib/geometry_kernels.h"
 
-#include <algorithm>
+#include <numbers>
 
 namespace quo {
 namespace {
@@ -85,43 +85,24 @@ int refine_ground_point(const Vec3& S, const Vec3& V, const RadarLook& look, dou
     return kForwardSteps;
 }
 
-Geodetic to_geodetic(const Vec3& p, const Ellipsoid& e) noexcept {
-    // B. R. Bowring, "Transformation from spatial to geographical coordinates", Survey Review 23(181), 1976: a
-    // fixed point in the parametric latitude, exact at once on the surface itself and gaining two digits or more a
-    // round elsewhere. Latitude is kept as a unit vector; no angle is formed before the end.
+int ground_point_at_height(const Vec3& S, const Vec3& V, const RadarLook& look, double omega, double height_m,
+                           const Ellipsoid& e, Vec3* P) noexcept {
+    constexpr double kClose = 1e-7;  // m
     constexpr int kRounds = 10;
-    const double a = e.equatorial_m, b = e.polar_m;
-    const double axis_distance = std::sqrt(p.x * p.x + p.y * p.y);
-    const double flat = a * a - b * b;
-    double c = b * axis_distance, s = a * p.z;  // parametric latitude's cosine and sine, up to a factor
-    double out = axis_distance, up = p.z;       // the normal's
+    if (!(e.equatorial_m > 0.0 && e.polar_m > 0.0)) return QUO_REFUSED;  // the lengthened axes could be
+    double longer_m = height_m;
     for (int round = 0; round < kRounds; ++round) {
-        const double length = std::max(std::sqrt(c * c + s * s), std::numeric_limits<double>::min());
-        c /= length;
-        s /= length;
-        out = std::max(axis_distance - flat / a * c * c * c, 0.0);
-        up = p.z + flat / b * s * s * s;
-        const double next_c = a * out, next_s = b * up;
-        const bool settled = std::abs(next_s * c - next_c * s) <= 1e-16 * (std::abs(next_s) + next_c);
-        c = next_c;
-        s = next_s;
-        if (settled) break;
+        Vec3 point;
+        const Ellipsoid raised{e.equatorial_m + longer_m, e.polar_m + longer_m};
+        if (const int status = turning_ground_point(S, V, look, omega, raised, &point)) return status;
+        const double lacking_m = height_m - to_geodetic(point, e).height_m;
+        if (std::abs(lacking_m) <= kClose) {
+            *P = point;
+            return QUO_OK;
+        }
+        longer_m += lacking_m;
     }
-    const double length = std::max(std::sqrt(out * out + up * up), std::numeric_limits<double>::min());
-    out /= length;
-    up /= length;
-    return {std::atan2(up, out) * kDegPerRad, std::atan2(p.y, p.x) * kDegPerRad,
-            axis_distance * out + p.z * up - std::sqrt(a * a * out * out + b * b * up * up)};
-}
-
-Vec3 from_geodetic(const Geodetic& g, const Ellipsoid& e) noexcept {
-    const double latitude = g.latitude_deg / kDegPerRad, longitude = g.longitude_deg / kDegPerRad;
-    const double out = std::cos(latitude), up = std::sin(latitude);
-    const double a2 = e.equatorial_m * e.equatorial_m, b2 = e.polar_m * e.polar_m;
-    const double support =
-        std::sqrt(a2 * out * out + b2 * up * up);  // distance of the tangent plane from the centre
-    const double across = (a2 / support + g.height_m) * out;
-    return {across * std::cos(longitude), across * std::sin(longitude), (b2 / support + g.height_m) * up};
+    return QUO_NUMERIC;
 }
 
 }  // namespace quo

@@ -3,44 +3,14 @@
 
 #include <cmath>
 #include <limits>
-#include <numbers>
 
-#include "quo_base/gr_pt.h"
+#include "quo_base/geometry.h"
 
 /* The geometry under the point solvers and the orbit model, without frames, reports or allocation. Metres,
- * seconds, hertz and degrees; conventions as in quo_base/gr_pt.h. Outputs are written only where 0 is returned. */
+ * seconds, hertz and degrees; conventions as in quo_base/geometry.h and quo_base/gr_pt.h. Outputs are written only
+ * where 0 is returned. */
 
 namespace quo {
-
-inline constexpr double kLightSpeed = 299792458.0;  // m/s
-inline constexpr double kDegPerRad = 180.0 / std::numbers::pi;
-
-struct Vec3 {
-    double x, y, z;
-};
-constexpr Vec3 operator+(const Vec3& a, const Vec3& b) noexcept { return {a.x + b.x, a.y + b.y, a.z + b.z}; }
-constexpr Vec3 operator-(const Vec3& a, const Vec3& b) noexcept { return {a.x - b.x, a.y - b.y, a.z - b.z}; }
-constexpr Vec3 operator*(double k, const Vec3& a) noexcept { return {k * a.x, k * a.y, k * a.z}; }
-constexpr double dot(const Vec3& a, const Vec3& b) noexcept { return a.x * b.x + a.y * b.y + a.z * b.z; }
-constexpr Vec3 cross(const Vec3& a, const Vec3& b) noexcept {
-    return {a.y * b.z - a.z * b.y, a.z * b.x - a.x * b.z, a.x * b.y - a.y * b.x};
-}
-inline double norm(const Vec3& a) noexcept { return std::sqrt(dot(a, a)); }
-constexpr Vec3 load(const double v[3]) noexcept { return {v[0], v[1], v[2]}; }
-constexpr void store(const Vec3& a, double v[3]) noexcept {
-    v[0] = a.x;
-    v[1] = a.y;
-    v[2] = a.z;
-}
-/** Angle between two directions, 0 to 180, accurate near 0 and 180 too. */
-inline double angle_deg(const Vec3& a, const Vec3& b) noexcept {
-    return std::atan2(norm(cross(a, b)), dot(a, b)) * kDegPerRad;
-}
-
-struct Ellipsoid {
-    double equatorial_m, polar_m;
-};
-inline constexpr Ellipsoid kWgs84{6378137.0, 6356752.314245};
 
 // --- Orbit segments ---------------------------------------------------------------------------------------------
 
@@ -77,20 +47,11 @@ constexpr OrbitState orbit_state(const OrbitSegment& c, double u) noexcept {
 
 // --- The ellipsoid ----------------------------------------------------------------------------------------------
 
-struct Geodetic {
-    double latitude_deg, longitude_deg, height_m;
-};
-
 /** Gradient of (x^2 + y^2) / a^2 + z^2 / b^2, times a^2: along the outward normal where p lies on the surface. */
 constexpr Vec3 ellipsoid_gradient(const Vec3& p, const Ellipsoid& e) noexcept {
     const double stretch = (e.equatorial_m / e.polar_m) * (e.equatorial_m / e.polar_m);
     return {p.x, p.y, stretch * p.z};
 }
-
-/** Geodetic coordinates of a point not within 50 km of the Earth's centre; longitude 0 on the axis. */
-Geodetic to_geodetic(const Vec3& p, const Ellipsoid& e) noexcept;
-
-Vec3 from_geodetic(const Geodetic& g, const Ellipsoid& e) noexcept;
 
 // --- Forward: from range time and Doppler to the ground ---------------------------------------------------------
 
@@ -242,6 +203,20 @@ constexpr Vec3 relative_velocity(const Vec3& S, const Vec3& V, double omega) noe
 int refine_ground_point(const Vec3& S, const Vec3& V, const RadarLook& look, double omega, const Ellipsoid& e,
                         Vec3* P) noexcept;
 
+/** Ground point for a velocity to be corrected by omega, where that is not 0. Statuses of ground_point(). */
+inline int turning_ground_point(const Vec3& S, const Vec3& V, const RadarLook& look, double omega,
+                                const Ellipsoid& e, Vec3* P) noexcept {
+    Vec3 point;
+    if (const int status = ground_point(S, relative_velocity(S, V, omega), look, e, &point)) return status;
+    if (omega != 0.0) refine_ground_point(S, V, look, omega, e, &point);
+    *P = point;
+    return QUO_OK;
+}
+
+/** The same at a height above the ellipsoid; see gr_pt_at_height(). */
+int ground_point_at_height(const Vec3& S, const Vec3& V, const RadarLook& look, double omega, double height_m,
+                           const Ellipsoid& e, Vec3* P) noexcept;
+
 // --- Inverse: from the ground to azimuth time and range time ----------------------------------------------------
 
 struct TimeSpan {
@@ -287,7 +262,7 @@ struct ImageTime {
 inline int image_time(const OrbitSegment& orbit, const Vec3& P, double start_s, const TimeSpan& span,
                       double lambda_m, double fd_hz, ImageTime* seen) noexcept {
     const double range_rate = 0.5 * lambda_m * fd_hz;
-    double t = start_s, range2 = 0.0;
+    double t = start_s, range2 = 0.0, slope = 0.0;
     bool settled = false;
     for (int step = 0; step < kInverseSteps && !settled; ++step) {
         if (!(t >= span.first_s && t <= span.last_s)) return QUO_NOT_SEEN;
@@ -295,9 +270,11 @@ inline int image_time(const OrbitSegment& orbit, const Vec3& P, double start_s, 
         const double change = at.value / at.slope;
         t -= change;
         range2 = at.range2_m2;
+        slope = at.slope;
         settled = std::abs(change) < kInverseStep;
     }
-    if (!std::isfinite(t)) return QUO_NOT_SEEN;
+    // A Doppler so large that the slope overflows makes a step of 0, which settles nothing.
+    if (!std::isfinite(t) || !std::isfinite(slope)) return QUO_NOT_SEEN;
     *seen = {t, 2.0 / kLightSpeed * std::sqrt(range2), settled};
     return QUO_OK;
 }
@@ -326,7 +303,7 @@ inline double fm_rate_hz_s(const OrbitState& s, const Vec3& P, double lambda_m, 
 /** Everything that is asked of the sample whose target is P. */
 inline GrPtGeometry sample_geometry(const OrbitState& s, const Vec3& P, double lambda_m, double omega,
                                     const Ellipsoid& e) noexcept {
-    const Geodetic place = to_geodetic(P, e);
+    const GeodeticPoint place = to_geodetic(P, e);
     return {{P.x, P.y, P.z},
             place.latitude_deg,
             place.longitude_deg,

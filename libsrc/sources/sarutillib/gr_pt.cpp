@@ -9,20 +9,9 @@ using quo::CallerFrame;
 using quo::CallFrame;
 using quo::Ellipsoid;
 using quo::OrbitState;
-using quo::RadarLook;
 using quo::Vec3;
 
 constexpr char kSource[] = R"(..\..\..\libsrc\sources\sarutillib\gr_pt)";
-
-int solve_ground_point(const Vec3& S, const Vec3& V, const RadarLook& look, double omega, const Ellipsoid& e,
-                       Vec3* P) noexcept {
-    Vec3 point;
-    if (const int status = quo::ground_point(S, quo::relative_velocity(S, V, omega), look, e, &point))
-        return status;
-    if (omega != 0.0) quo::refine_ground_point(S, V, look, omega, e, &point);
-    *P = point;
-    return QUO_OK;
-}
 
 int fail_start(CallerFrame frame, int status) noexcept {
     return frame.fail(status, status == QUO_REFUSED ? "Unusable platform, range, wavelength or ellipsoid"
@@ -64,7 +53,19 @@ extern "C" int gr_pt(double P[3], const double S[3], const double V[3], double t
     CallFrame frame{"gr_pt", kSource};
     Vec3 point;
     if (const int status =
-            solve_ground_point(quo::load(S), quo::load(V), {tau, fd, lambda, side}, omega, {a, b}, &point))
+            turning_ground_point(quo::load(S), quo::load(V), {tau, fd, lambda, side}, omega, {a, b}, &point))
+        return frame.callee(report_start(status));
+    quo::store(point, P);
+    return frame.success();
+}
+
+extern "C" int gr_pt_at_height(double P[3], const double S[3], const double V[3], double tau, double fd,
+                               double lambda, double omega, double side, double height, double a,
+                               double b) noexcept {
+    CallFrame frame{"gr_pt_at_height", kSource};
+    Vec3 point;
+    if (const int status = ground_point_at_height(quo::load(S), quo::load(V), {tau, fd, lambda, side}, omega,
+                                                  height, {a, b}, &point))
         return frame.callee(report_start(status));
     quo::store(point, P);
     return frame.success();
@@ -78,7 +79,7 @@ extern "C" int gr_pt_lat_lon(double tc, double /*dt*/, double t, double tau, dou
     const Ellipsoid earth{a, b};
     Vec3 point;
     if (const int status =
-            solve_ground_point(sat.position, sat.velocity, {tau, fd, lambda, side}, omega, earth, &point))
+            turning_ground_point(sat.position, sat.velocity, {tau, fd, lambda, side}, omega, earth, &point))
         return frame.callee(report_start(status));
     *out = quo::sample_geometry(sat, point, lambda, omega, earth);
     return frame.success();

@@ -7,7 +7,6 @@
 #include <vector>
 
 #include "commands.h"
-#include "earth.h"
 #include "failure.h"
 #include "number.h"
 #include "quo_base/SARpolynomials.h"
@@ -147,7 +146,7 @@ int compare(GeneralSAROrbit& orbit, const Place& at, Result& result) {
         double value = 0.0;
         if (q == kSlant) {  // takes ground range, gives range time after its reference
             polynomial.EvaluatePoly(polynomial.trg0 + at.ground_m, at.azimuth_s, &value);
-            value = 0.5 * kLightSpeed * (polynomial.trg0 + value - at.range_s);
+            value = 0.5 * quo::kLightSpeed * (polynomial.trg0 + value - at.range_s);
         } else {
             polynomial.EvaluatePoly(at.range_s, at.azimuth_s, &value);
         }
@@ -166,14 +165,14 @@ int compare_all(GeneralSAROrbit& orbit, const ROI_Obj& region, const polyDC& dc,
                  .range_s = 0.0,
                  .doppler_hz = 0.0,
                  .ground_m = 0.0};
-        Vector before{};
+        quo::Vec3 before{};
         for (int i = 0; i <= kChords; ++i) {
-            Vector point{};
+            double point[3] = {};
             at.range_s = region.FastStartTime + region.FastTimeLength * i / kChords;
             dc.EvaluatePoly(at.range_s, at.azimuth_s, &at.doppler_hz);
-            int status = orbit.sat2earth(at.azimuth_s, at.range_s, at.doppler_hz, point.v);
-            if (i > 0) at.ground_m += norm(point - before);
-            before = point;
+            int status = orbit.sat2earth(at.azimuth_s, at.range_s, at.doppler_hz, point);
+            if (i > 0) at.ground_m += norm(quo::load(point) - before);
+            before = quo::load(point);
             if (status == 0 && i % kEvery == 0) status = compare(orbit, at, result);
             if (status != 0) return status;
         }

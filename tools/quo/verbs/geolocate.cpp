@@ -6,7 +6,6 @@
 
 #include "apart.h"
 #include "commands.h"
-#include "earth.h"
 #include "failure.h"
 #include "interrupt.h"
 #include "number.h"
@@ -47,12 +46,12 @@ int to_ground(Scene& scene, const double* in, double doppler_hz, double* out) {
     const double time_s = in[0];
     const double range_s = in[1];
     if (!scene.covers(time_s)) return QUO_NOT_SEEN;
-    GeneralSAROrbit& orbit = scene.orbit();
-    int status = orbit.sat2earth(time_s, range_s, doppler_hz, out);
-    if (status == 0) status = orbit.SVGetLatLon(time_s, range_s, doppler_hz, out + 3, out + 4);
-    if (status == 0) status = orbit.SVGetAngles(time_s, range_s, doppler_hz, out + 5, out + 6);
-    if (status == 0) status = orbit.SVGetFR(time_s, range_s, doppler_hz, out + 7);
-    if (status == 0) status = orbit.SVGetSatSpeed(time_s, range_s, doppler_hz, out + 8);
+    GrPtGeometry at{};
+    const int status = scene.orbit().SVGetGeometry(time_s, range_s, doppler_hz, &at);
+    const auto& [x, y, z] = at.point_m;
+    const double values[] = {
+        x, y, z, at.latitude_deg, at.longitude_deg, at.incidence_deg, at.look_deg, at.fm_rate_hz_s, at.speed_m_s};
+    std::ranges::copy(values, out);
     return status;
 }
 
@@ -62,13 +61,14 @@ using Inverse = int (GeneralSAROrbit::*)(const double*, double*, double*, double
 // too.
 template <Inverse solve>
 int to_radar(Scene& scene, const double* in, double doppler_hz, double* out) {
-    const Geodetic ground{in[0], in[1], in[2]};
-    const Vector point = position(ground);
-    Vector platform{};
-    int status = (scene.orbit().*solve)(point.v, out, out + 1, doppler_hz);
-    if (status == 0) status = scene.orbit().SVGetPos(out[0], platform.v);
-    if (status == 0 && angle_deg(platform - point, normal(ground)) > 90.0) return QUO_NOT_SEEN;
-    return status;
+    const GeodeticPoint ground{in[0], in[1], in[2]};
+    double point[3], platform[3];
+    quo::store(quo::from_geodetic(ground), point);
+    int status = (scene.orbit().*solve)(point, out, out + 1, doppler_hz);
+    if (status == 0) status = scene.orbit().SVGetPos(out[0], platform);
+    if (status != 0) return status;
+    const quo::Vec3 line = quo::load(platform) - quo::load(point);
+    return angle_deg(line, quo::ellipsoid_normal(ground)) > 90.0 ? QUO_NOT_SEEN : QUO_OK;
 }
 
 constexpr Input kSample[] = {{"azimuth_time_s"}, {"range_time_s"}};

@@ -5,10 +5,8 @@
 #include <nlohmann/json.hpp>
 
 #include "commands.h"
-#include "earth.h"
 #include "failure.h"
 #include "number.h"
-#include "quo_base/gr_pt.h"
 #include "residuals.h"
 #include "scene.h"
 #include "shown.h"
@@ -26,7 +24,7 @@ struct TiepointsOptions {
 /** A ground point whose place in the image is known from elsewhere. */
 struct TiePoint {
     double time_s, range_s;
-    Geodetic ground;
+    GeodeticPoint ground;
     double incidence_deg;
 };
 
@@ -52,45 +50,27 @@ struct Agreement {
     std::int64_t solved() const { return points - unsolved; }
 };
 
-/** The ground point of a sample at a height above the ellipsoid.
- *
- * The surface of a constant height is no ellipsoid, but differs from the one with axes as much longer by
- * millimetres only. So the axes are corrected by the height that the point then has; two corrections leave
- * nothing. */
-int ground_at_height(GeneralSAROrbit& orbit, const TiePoint& tie, Vector& point) {
-    constexpr int kRounds = 3;
-    Vector position_m{};
-    Vector velocity_m_s{};
-    int status = orbit.SVGetPos(tie.time_s, position_m.v);
-    if (status == 0) status = orbit.SVGetVel(tie.time_s, velocity_m_s.v);
-    double raised_m = tie.ground.height_m;
-    for (int round = 0; round < kRounds && status == 0; ++round) {
-        status = gr_pt(point.v, position_m.v, velocity_m_s.v, tie.range_s, 0.0, orbit.getLambda(), 0.0,
-                       orbit.getLookSign(), kSemiMajor + raised_m, kSemiMinor + raised_m);
-        if (status == 0) raised_m += tie.ground.height_m - height_of(point);
-    }
-    return status;
-}
-
-double incidence_deg(GeneralSAROrbit& orbit, const TiePoint& tie, const Vector& point, Vertical vertical) {
-    const double* platform = orbit.SVGetPos(tie.time_s);
-    const Vector line_of_sight = Vector{{platform[0], platform[1], platform[2]}} - point;
-    return angle_deg(line_of_sight, vertical == Vertical::kGeocentricRadius ? point : normal(tie.ground));
+double incidence_deg(const quo::Vec3& platform, const TiePoint& tie, const quo::Vec3& point, Vertical vertical) {
+    return angle_deg(platform - point,
+                     vertical == Vertical::kGeocentricRadius ? point : quo::ellipsoid_normal(tie.ground));
 }
 
 int compare(GeneralSAROrbit& orbit, const TiePoint& tie, Agreement& agreement) {
-    const Vector truth = position(tie.ground);
+    double truth[3], point[3], platform[3];
+    quo::store(quo::from_geodetic(tie.ground), truth);
     double time_s = 0.0;
     double range_s = 0.0;
-    Vector point{};
-    int status = orbit.earth2sat(truth.v, &time_s, &range_s);
-    if (status == 0) status = ground_at_height(orbit, tie, point);
+    int status = orbit.earth2sat(truth, &time_s, &range_s);
+    if (status == 0) status = orbit.sat2earth(tie.time_s, tie.range_s, 0.0, tie.ground.height_m, point);
+    if (status == 0) status = orbit.SVGetPos(tie.time_s, platform);
     if (status != 0) return status;
 
+    const quo::Vec3 found = quo::load(point);
+    const double incidence = incidence_deg(quo::load(platform), tie, found, agreement.vertical);
     agreement.residuals[0].add((time_s - tie.time_s) * 1e6);
-    agreement.residuals[1].add((range_s - tie.range_s) * 0.5 * kLightSpeed);
-    agreement.residuals[2].add(norm(point - truth));
-    agreement.residuals[3].add(incidence_deg(orbit, tie, point, agreement.vertical) - tie.incidence_deg);
+    agreement.residuals[1].add((range_s - tie.range_s) * 0.5 * quo::kLightSpeed);
+    agreement.residuals[2].add(norm(found - quo::load(truth)));
+    agreement.residuals[3].add(incidence - tie.incidence_deg);
     return 0;
 }
 

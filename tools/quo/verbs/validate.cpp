@@ -9,7 +9,6 @@
 
 #include "commands.h"
 #include "document.h"
-#include "earth.h"
 #include "failure.h"
 #include "field_check.h"
 #include "number.h"
@@ -226,7 +225,7 @@ private:
     void check_sampling() {
         if (!has(gsSamplingConstants)) return;
         const SamplingConstants_Obj& s = product_.samplingConstants;
-        check_product("lambda_m", s.lambda_m, "fc_hz", s.fc_hz, kLightSpeed);
+        check_product("lambda_m", s.lambda_m, "fc_hz", s.fc_hz, quo::kLightSpeed);
         check_product("pri_s", s.pri_s, "prf_hz", s.prf_hz, 1.0);
         check_product("Trg_s", s.Trg_s, "frg_hz", s.frg_hz, 1.0);
         check_pulse(s);
@@ -310,9 +309,9 @@ private:
         const std::vector<Corner> grid = grid_corners(product_), orbit = orbit_corners(product_);
         if (grid.empty() || orbit.empty()) return;
         for (const Corner& corner : grid) {
-            const Vector place = position({corner.latitude_deg, corner.longitude_deg, 0.0});
+            const quo::Vec3 place = quo::from_geodetic({corner.latitude_deg, corner.longitude_deg, 0.0});
             const auto distance_m = [&](const Corner& other) {
-                return norm(position({other.latitude_deg, other.longitude_deg, 0.0}) - place);
+                return norm(quo::from_geodetic({other.latitude_deg, other.longitude_deg, 0.0}) - place);
             };
             const double nearest_m = distance_m(*std::ranges::min_element(orbit, {}, distance_m));
             if (nearest_m > kFar_m) {
