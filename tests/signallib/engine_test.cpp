@@ -30,16 +30,12 @@ TEST(FftEngine, IsTheOneAskedForOrTheOneThereIs) {
     struct Row {
         std::string choice, mkl, fftw, name;
     };
-    for (const Row& row : {Row{"mkl", fake, module, "mkl"},
-                           {"fftw", fake, module, "fftw"},
-                           {"auto", fake, none, "mkl"},
-                           {"auto", none, module, "fftw"},
-                           {"", none, module, "fftw"},
-                           {"mkl", none, module, "none"},
-                           {"fftw", fake, none, "none"},
-                           {"auto", none, none, "none"},
-                           {"auto", none, fake, "none"},
-                           {"auto", module, none, "none"}}) {
+    const Row rows[] = {{"mkl", fake, module, "mkl"}, {"fftw", fake, module, "fftw"},
+                        {"auto", fake, none, "mkl"},  {"auto", none, module, "fftw"},
+                        {"", none, module, "fftw"},   {"mkl", none, module, "none"},
+                        {"fftw", fake, none, "none"}, {"auto", none, none, "none"},
+                        {"auto", none, fake, "none"}, {"auto", module, none, "none"}};
+    for (const Row& row : rows) {
         const Engine engine{row.choice, row.mkl, row.fftw};
         EXPECT_STREQ(fft_engine_name(), row.name.c_str()) << row.choice << " " << row.mkl << " " << row.fftw;
         EXPECT_EQ(errno, 0) << "what the loader left";
@@ -101,11 +97,12 @@ TEST(FftMemory, BeyondWhatThereIsIsRefusedBeforeTheEngineAsksForIt) {
     };
     FftPlan plan{};
     Samples data = test::noise(8);
-    for (const Row& row : {Row{fft_makep_c, INT_MAX, 1, 0, 1},
-                           {fft_makep_c, 1, INT_MAX, 1, 0},
-                           {fft_makep_c, 7, INT_MAX, 1, 1},
-                           {fft_makep_r, INT_MAX, 1, 0, 1},
-                           {fft_makep_r, 7, INT_MAX, 1, 0}}) {
+    const Row rows[] = {{fft_makep_c, INT_MAX, 1, 0, 1},
+                        {fft_makep_c, 1, INT_MAX, 1, 0},
+                        {fft_makep_c, 7, INT_MAX, 1, 1},
+                        {fft_makep_r, INT_MAX, 1, 0, 1},
+                        {fft_makep_r, 7, INT_MAX, 1, 0}};
+    for (const Row& row : rows) {
         const AddressSpace limit{1 << 30};
         EXPECT_EQ(row.make(&plan, row.n, row.n, row.m, row.m, 1 - row.down, row.down, row.in_place), 4 + row.down);
         EXPECT_NE(std::string{fft_engine_error()}.find("not enough memory"), std::string::npos);
