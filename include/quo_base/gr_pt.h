@@ -93,7 +93,7 @@ QUO_BASE_API int gr_pt_lat_lon(double tc, double dt, double t, double tau, doubl
 /** Time at which a ground point is seen with a given Doppler, and its range time then.
  *
  * @param[out] t           time in [0, span], relative to the polynomials' reference time, s
- * @param[out] tau         two-way range time, s. Deliberately that of the last time but one: before the last,
+ * @param[out] tau         two-way range time, s. That of the last time but one: before the last,
  * shorter than 1e-8 s, step of t.
  * @param[in]  scratch     not used; may be null
  * @param[in]  cx, cy, cz  position polynomials, five coefficients each

@@ -211,7 +211,7 @@ std::vector<double> positions(int count, double first, double last) {
     return all;
 }
 
-TEST(Interp2, MeetsBandLimitedImagesWithinTheDocumentedError) {
+TEST(Interp2, MeetsBandLimitedImagesWithinTheStatedError) {
     const Tones slow{1.0, {{0.05, 0.0}}};
     struct Row {
         Scene scene;

@@ -87,7 +87,7 @@ int dpolfit(const double* x, const double* y, int n, double* c, int degree) {
     PowerSums sums{work.data(), terms};
     sums.add(x, y, n);
     sums.store(a, b);
-    // Deliberate: a singular system leaves whatever the elimination produced.
+    // A singular system is no failure of the fit: c gets what the elimination left.
     static_cast<void>(ldgaussj(a, terms, b, 1));
     for (int i = 0; i < terms; ++i) c[i] = b[i + 1][1];
     free_ldmatrix(b, 1, terms, 1, 1);
