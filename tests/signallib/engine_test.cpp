@@ -236,14 +236,12 @@ public:
     int made = 0;
 };
 
-quo::FftGeometry row_of(int length) { return {quo::FftDomain::Complex, length, 1, 1, length, true, true}; }
-
 TEST(PlanStore, MeasuresAGeometryOnceAndForgetsTheOneUsedLongestAgo) {
     CountingEngine engine;
     quo::PlanStore store;
     const auto made_by = [&](int length) {
         const int before = engine.made;
-        store.close(store.open(engine, row_of(length)));
+        store.close(store.open(engine, {quo::FftDomain::Complex, length, 1, 1, length, true, true}));
         return engine.made - before;
     };
     constexpr int kMost = quo::PlanStore::kMostKept;
@@ -254,20 +252,18 @@ TEST(PlanStore, MeasuresAGeometryOnceAndForgetsTheOneUsedLongestAgo) {
     EXPECT_EQ(made_by(1), 0);
     EXPECT_EQ(made_by(2), 1);
     EXPECT_EQ(store.held(), 0U);
-}
 
-TEST(PlanStore, BoundsTheMemoryOfWhatItKeeps) {
-    CountingEngine engine;
-    quo::PlanStore store;
+    // The memory of what is kept is bounded, too.
+    quo::PlanStore full;
     constexpr int kLength = 20000, kTileRow = 64 + 8;  // a tile of 11 MB
-    FftEnginePlan* const held = store.open(engine, {quo::FftDomain::Complex, kLength, 70, 80, 1, true, true});
+    FftEnginePlan* const held = full.open(engine, {quo::FftDomain::Complex, kLength, 70, 80, 1, true, true});
     for (int extra = 1; extra <= 8; ++extra)
-        store.close(store.open(engine, {quo::FftDomain::Complex, kLength + extra, 70, 80, 1, true, true}));
-    EXPECT_EQ(store.kept(), quo::PlanStore::kMostKeptBytes / (kLength * kTileRow * sizeof(fcomplex)));
-    EXPECT_NE(store.find(held), nullptr) << "a caller's plan stays, kept or not";
-    EXPECT_TRUE(store.close(held));
-    EXPECT_EQ(store.find(held), nullptr);
-    EXPECT_FALSE(store.close(held));
+        full.close(full.open(engine, {quo::FftDomain::Complex, kLength + extra, 70, 80, 1, true, true}));
+    EXPECT_EQ(full.kept(), quo::PlanStore::kMostKeptBytes / (kLength * kTileRow * sizeof(fcomplex)));
+    EXPECT_NE(full.find(held), nullptr) << "a caller's plan stays, kept or not";
+    EXPECT_TRUE(full.close(held));
+    EXPECT_EQ(full.find(held), nullptr);
+    EXPECT_FALSE(full.close(held));
 }
 
 }  // namespace

@@ -339,20 +339,17 @@ TEST(Fftshift, MovesSampleZeroToTheMiddleAndBack) {
 }
 
 TEST(FftMalloc, GivesAlignedBlocksAndRefusesWhatCannotBe) {
-    for (const std::size_t bytes : {0, 1, 17, 4096, 1000003}) {
-        auto* block = static_cast<unsigned char*>(fft_malloc(bytes));
-        ASSERT_NE(block, nullptr);
+    for (const std::size_t bytes : {0, 1, 17, 1000003}) {
+        auto* const block = static_cast<unsigned char*>(fft_malloc(bytes));
         EXPECT_EQ(reinterpret_cast<std::uintptr_t>(block) % 16, 0U);
         std::fill_n(block, bytes, static_cast<unsigned char>(0xA5));  // the sanitizer looks at the ends
         fft_free(block);
+        auto* const zeros = static_cast<unsigned char*>(fft_calloc(bytes, 3));
+        EXPECT_EQ(std::count(zeros, zeros + 3 * bytes, 0), static_cast<std::ptrdiff_t>(3 * bytes));
+        fft_free(zeros);
     }
-    auto* zeros = static_cast<unsigned char*>(fft_calloc(37, 27));
-    ASSERT_NE(zeros, nullptr);
-    EXPECT_EQ(std::count(zeros, zeros + 37 * 27, 0), 37 * 27);
-    fft_free(zeros);
     fft_free(nullptr);
-    EXPECT_EQ(fft_malloc(SIZE_MAX - 3), nullptr);
-    EXPECT_EQ(fft_calloc(SIZE_MAX / 2, 3), nullptr);
+    EXPECT_FALSE(fft_malloc(SIZE_MAX - 3) || fft_calloc(SIZE_MAX / 2, 3));
     errno = 0;
 }
 
