@@ -182,22 +182,16 @@ TEST_F(ReportFile, NumbersErrorsAndCallTreeLines) {
                   closing("Zürich 17", "Thu Apr  3 22:02:43 2014\n"));
 }
 
-TEST_F(ReportFile, KeepsLongMessagesWholeAndBoundsTheTitle) {
+TEST_F(ReportFile, KeepsLongMessagesWholeBoundsTheTitleAndShowsNullTexts) {
     const std::string endless(300000, 'x'), title(4095, 'x');
+    const test::CapturedStderr echo;
     init_report(name.c_str(), endless.c_str(), 1);
     warn(endless.c_str());
-    warn("b");
-    exit_report();
-    EXPECT_EQ(test::read_text(name),
-              opening(1, title) + warning(0, endless) + warning(1, "b") + closing(title, kLaunchDate));
-}
-
-TEST_F(ReportFile, ShowsNullTexts) {
-    init_report(name.c_str(), nullptr, 1);
+    for (const int kind : {QUO_MESSAGE, QUO_ERROR_CALL_TREE, QUO_ERROR})
+        quo_add_report(nullptr, kind, 1, nullptr, nullptr);
+    EXPECT_THAT(test::read_text(name), testing::StartsWith(opening(1, title) + warning(0, endless)));
+    EXPECT_THAT(test::read_text(name), HasSubstr("    . Call tree: FILE (null), FUNCTION (null), LINE 1.\n"));
     init_log(log_name.c_str(), nullptr, 1);
-    const test::CapturedStderr echo;
-    for (const int kind : {0, 3, 6, 99}) quo_add_report(nullptr, kind, 1, nullptr, nullptr);
-    EXPECT_THAT(body(), HasSubstr("    . Call tree: FILE (null), FUNCTION (null), LINE 1.\n"));
     quo_add_log(nullptr);
     exit_report();
     EXPECT_EQ(test::read_text(log_name), "\n0) (null)\n");
