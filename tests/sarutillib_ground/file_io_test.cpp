@@ -10,7 +10,6 @@
 
 #include <cerrno>
 #include <cstdint>
-#include <cstdlib>
 #include <filesystem>
 #include <limits>
 #include <string>
@@ -187,36 +186,26 @@ TEST_F(AtomicFileTest, WritesInPlaceWhereNothingCanBeReplaced) {
     EXPECT_TRUE(fs::is_character_file("/dev/null"));
 }
 
-/** A user who may do what the group may. */
-class Member {
-public:
-    explicit Member(gid_t group) {
-        ready_ = setgroups(1, &group) == 0 && setegid(1001) == 0 && seteuid(1001) == 0;
-    }
-    ~Member() {
-        if (seteuid(0) != 0 || setegid(0) != 0 || setgroups(0, nullptr) != 0) std::abort();
-    }
-    Member(const Member&) = delete;
-    Member& operator=(const Member&) = delete;
-    [[nodiscard]] bool ready() const { return ready_; }
-
-private:
-    bool ready_ = false;
-};
+/** Whether a process of its own, which ends without cleaning up, succeeds. */
+template <typename Work>
+bool succeeds_apart(Work work) {
+    const pid_t child = fork();
+    if (child == 0) _exit(work() ? 0 : 1);
+    int status = -1;
+    return waitpid(child, &status, 0) == child && status == 0;
+}
 
 // Owner and group were taken over together or not at all: the group lost a file as soon as another member saved
 // it.
 TEST_F(AtomicFileTest, LeavesAFileToItsGroup) {
-    constexpr uid_t kOwner = 1000;
-    constexpr gid_t kGroup = 2000;
-    if (geteuid() != 0 || chown(name_.c_str(), kOwner, kGroup) != 0) GTEST_SKIP() << "needs the administrator";
+    constexpr gid_t kGroup = 2000, kOther = 1001;
+    if (geteuid() != 0 || chown(name_.c_str(), 1000, kGroup) != 0) GTEST_SKIP() << "needs the administrator";
     chmod(name_.c_str(), 0660);
     chmod(folder_.path().c_str(), 0777);
-    {
-        const Member member{kGroup};
-        ASSERT_TRUE(member.ready());
-        EXPECT_TRUE(replace(name_, "new"));
-    }
+    EXPECT_TRUE(succeeds_apart([&] {
+        const bool member = setgroups(1, &kGroup) == 0 && setegid(kOther) == 0 && seteuid(kOther) == 0;
+        return member && replace(name_, "new");
+    }));
     struct stat found {};
     EXPECT_EQ(stat(name_.c_str(), &found), 0);
     EXPECT_EQ(found.st_gid, kGroup);
@@ -228,14 +217,7 @@ TEST_F(AtomicFileTest, LeavesAFileToItsGroup) {
 // one's.
 TEST_F(AtomicFileTest, SweepsWhatKilledProcessesLeft) {
     for (int killed = 0; killed < 3; ++killed) {
-        if (const pid_t child = fork(); child == 0) {
-            AtomicFile file{name_.c_str()};
-            _exit(file.write("half") ? 0 : 1);
-        } else {
-            int status = 0;
-            ASSERT_EQ(waitpid(child, &status, 0), child);
-            EXPECT_EQ(status, 0);
-        }
+        EXPECT_TRUE(succeeds_apart([&] { return (new AtomicFile{name_.c_str()})->write("half"); }));
         expect_header("old", 1);
     }
     AtomicFile living{name_.c_str()};
