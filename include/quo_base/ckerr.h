@@ -63,7 +63,7 @@ QUO_BASE_API void exit_ckerr(void) QUO_NOEXCEPT;
 
 /** Opens the report: creates or empties the file and writes a banner with title, level and local time.
  *
- * Report and log share one title and one start time (deliberate): opening the log after the report makes the
+ * Report and log share one title and one start time: opening the log after the report makes the
  * report count its elapsed seconds from then on and close with the log's title.
  * @param file_name  opened for appending first, so that a file that cannot be written stays as it is
  * @param title      at most 4095 bytes are kept
@@ -136,8 +136,8 @@ QUO_BASE_API void* malloc_ckerr(size_t size) QUO_NOEXCEPT;
  * @return the block, owned by the caller, or null as there */
 QUO_BASE_API void* calloc_ckerr(size_t count, size_t size) QUO_NOEXCEPT;
 
-/** Frees a block. While tracking is on, a block that is not in the table is neither freed nor reported
- * (deliberate), and null takes the first null entry, if there is one, out of the table. The table's last entry
+/** Frees a block. While tracking is on, a block that is not in the table is neither freed nor reported,
+ * and null takes the first null entry, if there is one, out of the table. The table's last entry
  * moves to the place of the one that goes. */
 QUO_BASE_API void free_ckerr(void* block) QUO_NOEXCEPT;
 

@@ -303,7 +303,7 @@ public:
     /** Moves to another place; a place before the start is ignored. An offset of 0 changes nothing, whatever the
      * type. What a buffer held and could not be written is given up when the place leaves the buffer. */
     void seek(int64_t offset, int type);
-    /** The place of the next byte; deliberate: with a buffer in mode READ_WRITE, the place of the buffer's start.
+    /** The place of the next byte; with a buffer in mode READ_WRITE, the place of the buffer's start.
      */
     [[nodiscard]] int64_t tell() const;
     /** Bytes read: fewer than n at the end of the file, 0 in mode WRITE. */
@@ -319,7 +319,7 @@ public:
      * SHORT_COMPLEX; values going to an integer type are rounded half away from zero and held at its bounds, no
      * number becomes 0. Any other combination, a closed file, a file in mode WRITE (reading) or READ (writing), or
      * a block that does not lie within the lines or, reading, the file, leaves everything untouched. Afterwards
-     * the place is the line after the block. Deliberate: from `double`, only FLOAT64, INT32 and INT16 files are
+     * the place is the line after the block. From `double`, only FLOAT64, INT32 and INT16 files are
      * written; from `fcomplex`, DOUBLE_COMPLEX files are not written, and FLOAT64 files get two doubles for each
      * of the `samples`, where lines without room for them grow: the next one follows at once.
      * @{ */

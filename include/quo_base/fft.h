@@ -157,7 +157,7 @@ QUO_BASE_API int czt_c(const fcomplex* in, int N, fcomplex* out, int M, double w
 
 /* ---- Lengths, halves, buffers ---- */
 
-/** First of the lengths n, n + step, n + 2 step, ... whose prime factors are 2, 3 and 5 only. Deliberate: 5625 is
+/** First of the lengths n, n + step, n + 2 step, ... whose prime factors are 2, 3 and 5 only. 5625 is
  * never returned; where it would be, the search starts again at 5626 with the same step.
  * @return the length; 0 for n < 1, and where there is none up to the greatest int (so for step < 1 unless n itself
  * is one) */

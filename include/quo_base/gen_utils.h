@@ -65,19 +65,19 @@ QUO_BASE_API void swp_any(void* buffer, int64_t length_in_bytes, int element_siz
  * @param[in] swap          0: leave everything as it is
  * @return 0, or -1 for any other element size (nothing is touched; not tested when `swap` is 0).
  *
- * Deliberate: for elements of 16 bytes `count` is taken as a length in bytes, so only the first count / 16
+ * For elements of 16 bytes `count` is taken as a length in bytes, so only the first count / 16
  * elements are swapped, each as one number of 16 bytes. */
 QUO_BASE_API int get_endian(void* buffer, int64_t count, int element_size, int swap) QUO_NOEXCEPT;
 
 /* Number classes: 1 or 0 from the bit pattern alone. */
 
-/** Double: only the high 32-bit word is looked at. Deliberate: a not-a-number whose fraction bits all lie in the
+/** Double: only the high 32-bit word is looked at. A not-a-number whose fraction bits all lie in the
  * low word counts as infinite and not as not-a-number. */
 QUO_BASE_API int myisinf(double x) QUO_NOEXCEPT;
 QUO_BASE_API int myisnan(double x) QUO_NOEXCEPT;
 QUO_BASE_API int myfinite(double x) QUO_NOEXCEPT;
 
-/** Float. Deliberate: plus and minus the largest finite float (0x7F7FFFFF) count as infinite and as not finite. */
+/** Float. Plus and minus the largest finite float (0x7F7FFFFF) count as infinite and as not finite. */
 QUO_BASE_API int myisinf4(float x) QUO_NOEXCEPT;
 QUO_BASE_API int myisnan4(float x) QUO_NOEXCEPT;
 QUO_BASE_API int myfinite4(float x) QUO_NOEXCEPT;
@@ -144,7 +144,7 @@ QUO_BASE_API void mjd2ascii(MjdRecord record, char* text_out) QUO_NOEXCEPT;
  * @param[out] fields_out  unchanged unless 0 is returned
  * @return 0, DATE_NO_TEXT, or the other DateError flags combined.
  *
- * Deliberate: day 0, hour 24, minute 60 and second 60 pass; leap years are Gregorian. With an unknown month the
+ * Day 0, hour 24, minute 60 and second 60 pass; leap years are Gregorian. With an unknown month the
  * day is only tested for being negative. */
 QUO_BASE_API int date2str(const char* text, DateFields* fields_out) QUO_NOEXCEPT;
 
@@ -176,7 +176,7 @@ QUO_BASE_API int myfseek64_msc(FILE* stream, int64_t offset64, int whence) QUO_N
 QUO_BASE_API int check_fsep(char* path) QUO_NOEXCEPT;
 
 /** Points into `path`: behind the last slash; behind the last backslash only when there is no slash at all; else
- * at its begin. Null for null. Deliberate: a backslash after the last slash belongs to the name. */
+ * at its begin. Null for null. A backslash after the last slash belongs to the name. */
 QUO_BASE_API const char* getFileNameFromPath(const char* path) QUO_NOEXCEPT;
 
 /** Copies a whole file, into the destination in place where no other file can be put there. Always 0, as its

@@ -38,7 +38,7 @@ public:
      * M and transformed back, so that band-limited periodic data is met within 1e-6 of its root mean square. Equal
      * sizes are copied.
      *
-     * Deliberate: along the rows, the Nyquist bin of an even N is halved and mirrored in the first row only, and
+     * Along the rows, the Nyquist bin of an even N is halved and mirrored in the first row only, and
      * halved once for every row of the image, so that R rows leave 0.5^R of it; all other rows keep theirs whole
      * with nothing at the mirrored place. Down the columns it is halved and mirrored everywhere, once.
      *

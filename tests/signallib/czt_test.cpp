@@ -28,13 +28,14 @@ TEST_P(Czt, EqualsTheDirectSum) {
         int n, m;
         double w, a;
     };
-    for (const Row& row : {Row{16, 16, -0.3926990816987241, 0.0},
-                           {17, 5, 0.0137, 1.3},
-                           {5, 43, -0.0271, -2.9},
-                           {1, 7, 0.3, 0.7},
-                           {7, 1, 0.3, 0.7},
-                           {1, 1, 0.3, 0.7},
-                           {60, 31, 0.0, 0.4}}) {
+    const Row rows[] = {{16, 16, -0.3926990816987241, 0.0},
+                        {17, 5, 0.0137, 1.3},
+                        {5, 43, -0.0271, -2.9},
+                        {1, 7, 0.3, 0.7},
+                        {7, 1, 0.3, 0.7},
+                        {1, 1, 0.3, 0.7},
+                        {60, 31, 0.0, 0.4}};
+    for (const Row& row : rows) {
         SCOPED_TRACE(testing::Message() << row.n << " to " << row.m);
         constexpr int kVectors = 3;
         const Samples in = test::noise(static_cast<std::size_t>(row.n * kVectors));
@@ -45,15 +46,6 @@ TEST_P(Czt, EqualsTheDirectSum) {
             EXPECT_LE(test::relative_error(got, direct(in.data() + v * row.n, row.n, row.m, row.w, row.a)), 2e-6);
         }
     }
-}
-
-TEST_P(Czt, WithTheStepOfTheTransformIsTheTransform) {
-    constexpr int n = 50;
-    const Samples in = test::noise(n);
-    Samples zoomed(n), spectrum(n);
-    ASSERT_EQ(czt_c(in.data(), n, zoomed.data(), n, -2.0 * std::numbers::pi / n, 0.0, 1), 0);
-    ASSERT_EQ(fft_c(n, n, 1, 1, 1, 0, in.data(), spectrum.data()), 0);
-    EXPECT_LE(test::relative_error(zoomed, spectrum), 2e-6);
 }
 
 INSTANTIATE_TEST_SUITE_P(Engines, Czt, testing::ValuesIn(test::kEngines),

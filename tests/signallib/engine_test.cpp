@@ -30,16 +30,12 @@ TEST(FftEngine, IsTheOneAskedForOrTheOneThereIs) {
     struct Row {
         std::string choice, mkl, fftw, name;
     };
-    for (const Row& row : {Row{"mkl", fake, module, "mkl"},
-                           {"fftw", fake, module, "fftw"},
-                           {"auto", fake, none, "mkl"},
-                           {"auto", none, module, "fftw"},
-                           {"", none, module, "fftw"},
-                           {"mkl", none, module, "none"},
-                           {"fftw", fake, none, "none"},
-                           {"auto", none, none, "none"},
-                           {"auto", none, fake, "none"},
-                           {"auto", module, none, "none"}}) {
+    const Row rows[] = {{"mkl", fake, module, "mkl"}, {"fftw", fake, module, "fftw"},
+                        {"auto", fake, none, "mkl"},  {"auto", none, module, "fftw"},
+                        {"", none, module, "fftw"},   {"mkl", none, module, "none"},
+                        {"fftw", fake, none, "none"}, {"auto", none, none, "none"},
+                        {"auto", none, fake, "none"}, {"auto", module, none, "none"}};
+    for (const Row& row : rows) {
         const Engine engine{row.choice, row.mkl, row.fftw};
         EXPECT_STREQ(fft_engine_name(), row.name.c_str()) << row.choice << " " << row.mkl << " " << row.fftw;
         EXPECT_EQ(errno, 0) << "what the loader left";
@@ -101,11 +97,12 @@ TEST(FftMemory, BeyondWhatThereIsIsRefusedBeforeTheEngineAsksForIt) {
     };
     FftPlan plan{};
     Samples data = test::noise(8);
-    for (const Row& row : {Row{fft_makep_c, INT_MAX, 1, 0, 1},
-                           {fft_makep_c, 1, INT_MAX, 1, 0},
-                           {fft_makep_c, 7, INT_MAX, 1, 1},
-                           {fft_makep_r, INT_MAX, 1, 0, 1},
-                           {fft_makep_r, 7, INT_MAX, 1, 0}}) {
+    const Row rows[] = {{fft_makep_c, INT_MAX, 1, 0, 1},
+                        {fft_makep_c, 1, INT_MAX, 1, 0},
+                        {fft_makep_c, 7, INT_MAX, 1, 1},
+                        {fft_makep_r, INT_MAX, 1, 0, 1},
+                        {fft_makep_r, 7, INT_MAX, 1, 0}};
+    for (const Row& row : rows) {
         const AddressSpace limit{1 << 30};
         EXPECT_EQ(row.make(&plan, row.n, row.n, row.m, row.m, 1 - row.down, row.down, row.in_place), 4 + row.down);
         EXPECT_NE(std::string{fft_engine_error()}.find("not enough memory"), std::string::npos);
@@ -239,14 +236,12 @@ public:
     int made = 0;
 };
 
-quo::FftGeometry row_of(int length) { return {quo::FftDomain::Complex, length, 1, 1, length, true, true}; }
-
 TEST(PlanStore, MeasuresAGeometryOnceAndForgetsTheOneUsedLongestAgo) {
     CountingEngine engine;
     quo::PlanStore store;
     const auto made_by = [&](int length) {
         const int before = engine.made;
-        store.close(store.open(engine, row_of(length)));
+        store.close(store.open(engine, {quo::FftDomain::Complex, length, 1, 1, length, true, true}));
         return engine.made - before;
     };
     constexpr int kMost = quo::PlanStore::kMostKept;
@@ -257,20 +252,18 @@ TEST(PlanStore, MeasuresAGeometryOnceAndForgetsTheOneUsedLongestAgo) {
     EXPECT_EQ(made_by(1), 0);
     EXPECT_EQ(made_by(2), 1);
     EXPECT_EQ(store.held(), 0U);
-}
 
-TEST(PlanStore, BoundsTheMemoryOfWhatItKeeps) {
-    CountingEngine engine;
-    quo::PlanStore store;
+    // The memory of what is kept is bounded, too.
+    quo::PlanStore full;
     constexpr int kLength = 20000, kTileRow = 64 + 8;  // a tile of 11 MB
-    FftEnginePlan* const held = store.open(engine, {quo::FftDomain::Complex, kLength, 70, 80, 1, true, true});
+    FftEnginePlan* const held = full.open(engine, {quo::FftDomain::Complex, kLength, 70, 80, 1, true, true});
     for (int extra = 1; extra <= 8; ++extra)
-        store.close(store.open(engine, {quo::FftDomain::Complex, kLength + extra, 70, 80, 1, true, true}));
-    EXPECT_EQ(store.kept(), quo::PlanStore::kMostKeptBytes / (kLength * kTileRow * sizeof(fcomplex)));
-    EXPECT_NE(store.find(held), nullptr) << "a caller's plan stays, kept or not";
-    EXPECT_TRUE(store.close(held));
-    EXPECT_EQ(store.find(held), nullptr);
-    EXPECT_FALSE(store.close(held));
+        full.close(full.open(engine, {quo::FftDomain::Complex, kLength + extra, 70, 80, 1, true, true}));
+    EXPECT_EQ(full.kept(), quo::PlanStore::kMostKeptBytes / (kLength * kTileRow * sizeof(fcomplex)));
+    EXPECT_NE(full.find(held), nullptr) << "a caller's plan stays, kept or not";
+    EXPECT_TRUE(full.close(held));
+    EXPECT_EQ(full.find(held), nullptr);
+    EXPECT_FALSE(full.close(held));
 }
 
 }  // namespace

@@ -46,54 +46,40 @@ Vector direct(const Vector& x, double sign) {
     return y;
 }
 
-/** Samples, or a packed real spectrum, as complex numbers. */
-Vector load(const Descriptor& d, const float* at, Long stride, bool forward) {
-    const auto n = static_cast<std::size_t>(d.length);
-    Vector x(n);
-    const auto value = [&](std::size_t k) { return static_cast<double>(at[static_cast<Long>(k) * stride]); };
-    for (std::size_t k = 0; k < n; ++k) {
-        if (!d.real) {
-            const float* sample = at + 2 * static_cast<Long>(k) * stride;
-            x[k] = {sample[0], sample[1]};
-        } else if (forward) {
-            x[k] = value(k);
-        } else if (const std::size_t bin = k <= n / 2 ? k : n - k; bin == 0) {
-            x[k] = value(0);
-        } else {
-            x[k] = {value(2 * bin - 1), 2 * bin < n ? value(2 * bin) : 0.0};
-            if (k > n / 2) x[k] = std::conj(x[k]);
-        }
-    }
-    return x;
+/** Of a packed real spectrum, number k is the real or imaginary part of bin (k + 1) / 2. */
+double& packed(Vector& spectrum, std::size_t k) {
+    return reinterpret_cast<double(&)[2]>(spectrum[(k + 1) / 2])[k % 2 == 1 || k == 0 ? 0 : 1];
 }
 
-void store(const Descriptor& d, const Vector& y, float* at, Long stride, bool forward) {
+/** One transform of `d`, whose samples lie `stride` apart. */
+void transform(Descriptor& d, const float* in, float* out, bool forward) {
     const auto n = static_cast<std::size_t>(d.length);
-    for (std::size_t k = 0; k < n; ++k) {
-        float* const to = at + (d.real ? 1 : 2) * static_cast<Long>(k) * stride;
-        if (!d.real) {
-            to[0] = static_cast<float>(y[k].real());
-            to[1] = static_cast<float>(y[k].imag());
-        } else if (!forward || k == 0) {
-            *to = static_cast<float>(y[k].real());
-        } else {
-            const auto& bin = y[(k + 1) / 2];
-            *to = static_cast<float>(k % 2 == 1 ? bin.real() : bin.imag());
-        }
-    }
-}
-
-Long compute(void* handle, void* in, void* out, bool forward) {
-    auto& d = *static_cast<Descriptor*>(handle);
-    if (!d.committed) return kBadDescriptor;
-    auto& v = d.values;
-    if (v[kPlacement] == kInPlace) out = in;
     const Long floats = d.real ? 1 : 2;
-    for (Long t = 0; t < v[kTransforms]; ++t) {
-        const float* from = static_cast<const float*>(in) + t * v[kInDistance] * floats;
-        float* to = static_cast<float*>(out) + t * v[kOutDistance] * floats;
-        store(d, direct(load(d, from, v[kInStrides], forward), forward ? -1.0 : 1.0), to, v[kOutStrides], forward);
+    Vector x(n);
+    for (std::size_t k = 0; k < n; ++k) {
+        const float* const sample = in + static_cast<Long>(k) * d.values[kInStrides] * floats;
+        if (!d.real || forward) x[k] = {sample[0], d.real ? 0.0F : sample[1]};
+        if (d.real && !forward) packed(x, k) = *sample;
     }
+    if (d.real && !forward)
+        for (std::size_t k = n / 2 + 1; k < n; ++k) x[k] = std::conj(x[n - k]);
+    x = direct(x, forward ? -1.0 : 1.0);
+    for (std::size_t k = 0; k < n; ++k) {
+        float* const sample = out + static_cast<Long>(k) * d.values[kOutStrides] * floats;
+        sample[0] = static_cast<float>(d.real && forward ? packed(x, k) : x[k].real());
+        if (!d.real) sample[1] = static_cast<float>(x[k].imag());
+    }
+}
+
+/** The output follows the input unless both are one. */
+Long compute(void* handle, void* in, std::va_list more, bool forward) {
+    auto& d = *static_cast<Descriptor*>(handle);
+    if (told_to_fail("compute") || !d.committed) return kBadDescriptor;
+    void* const out = d.values[kPlacement] == kNotInPlace ? va_arg(more, void*) : in;
+    const Long floats = d.real ? 1 : 2;
+    for (Long t = 0; t < d.values[kTransforms]; ++t)
+        transform(d, static_cast<const float*>(in) + t * d.values[kInDistance] * floats,
+                  static_cast<float*>(out) + t * d.values[kOutDistance] * floats, forward);
     return kOk;
 }
 
@@ -120,23 +106,13 @@ FAKE_API Long DftiCreateDescriptor(void** handle, int precision, int domain, Lon
 }
 
 FAKE_API Long DftiSetValue(void* handle, int parameter, ...) {
-    auto& d = *static_cast<Descriptor*>(handle);
     std::va_list more;
     va_start(more, parameter);
-    switch (parameter) {
-        case kTransforms:
-        case kInDistance:
-        case kOutDistance:
-        case kThreads:
-            d.values[parameter] = va_arg(more, Long);
-            break;
-        case kInStrides:
-        case kOutStrides:
-            d.values[parameter] = va_arg(more, Long*)[1];
-            break;
-        default:
-            d.values[parameter] = va_arg(more, int);
-    }
+    Long& value = static_cast<Descriptor*>(handle)->values[parameter];
+    const bool strides = parameter == kInStrides || parameter == kOutStrides;
+    const bool is_long =
+        parameter == kTransforms || parameter == kInDistance || parameter == kOutDistance || parameter == kThreads;
+    value = strides ? va_arg(more, Long*)[1] : is_long ? va_arg(more, Long) : va_arg(more, int);
     va_end(more);
     return told_to_fail("set") && parameter == kOutStrides ? kUnimplemented : kOk;
 }
@@ -154,19 +130,17 @@ FAKE_API Long DftiCommitDescriptor(void* handle) {
 FAKE_API Long DftiComputeForward(void* handle, void* in, ...) {
     std::va_list more;
     va_start(more, in);
-    const bool apart = static_cast<Descriptor*>(handle)->values[kPlacement] == kNotInPlace;
-    void* out = apart ? va_arg(more, void*) : nullptr;
+    const Long status = compute(handle, in, more, true);
     va_end(more);
-    return told_to_fail("compute") ? Long{kBadDescriptor} : compute(handle, in, out, true);
+    return status;
 }
 
 FAKE_API Long DftiComputeBackward(void* handle, void* in, ...) {
     std::va_list more;
     va_start(more, in);
-    const bool apart = static_cast<Descriptor*>(handle)->values[kPlacement] == kNotInPlace;
-    void* out = apart ? va_arg(more, void*) : nullptr;
+    const Long status = compute(handle, in, more, false);
     va_end(more);
-    return told_to_fail("compute") ? Long{kBadDescriptor} : compute(handle, in, out, false);
+    return status;
 }
 
 FAKE_API Long DftiFreeDescriptor(void** handle) {

@@ -3,9 +3,10 @@
 #include <libxml/tree.h>
 
 #include <algorithm>
-#include <bit>
 #include <cstddef>
 #include <cstdint>
+
+#include "sarutillib/utf8.h"
 
 namespace quo {
 namespace {
@@ -15,28 +16,6 @@ namespace {
 constexpr std::size_t kLongestText = 9'999'999;
 constexpr std::ptrdiff_t kMostParts = 250;
 constexpr std::size_t kLongestPath = 511;
-
-/** A character at the start of a text; length 0 when no well-formed UTF-8 sequence stands there. */
-struct Character {
-    std::uint32_t code;
-    std::size_t length;
-};
-
-Character decode(std::string_view text) {
-    constexpr std::uint32_t kLeast[] = {0, 0, 0x80, 0x800, 0x10000};  // shortest form only, by length
-    const auto first = static_cast<std::uint8_t>(text.front());
-    if (first < 0x80) return {first, 1};
-    const auto length = static_cast<std::size_t>(std::countl_one(first));
-    if (length < 2 || length > 4 || text.size() < length) return {0, 0};
-    std::uint32_t code = first & (0xFFU >> (length + 1));
-    for (std::size_t i = 1; i < length; ++i) {
-        const auto next = static_cast<std::uint8_t>(text[i]);
-        if ((next & 0xC0U) != 0x80) return {0, 0};
-        code = code << 6U | (next & 0x3FU);
-    }
-    const bool surrogate = code >= 0xD800 && code <= 0xDFFF;
-    return code < kLeast[length] || code > 0x10FFFF || surrogate ? Character{0, 0} : Character{code, length};
-}
 
 constexpr bool is_xml_character(std::uint32_t code) {
     if (code < 0x20) return code == '\t' || code == '\n' || code == '\r';
@@ -51,7 +30,7 @@ void append_latin1(std::string& text, char byte) {
 
 bool is_utf8(std::string_view text) {
     while (!text.empty()) {
-        const std::size_t length = decode(text).length;
+        const std::size_t length = first_utf8(text).length;
         if (length == 0) return false;
         text.remove_prefix(length);
     }
@@ -70,7 +49,7 @@ std::optional<std::string> xml_text(std::string_view text) {
     std::string result;
     std::size_t copied = 0;
     for (std::size_t place = 0; place < text.size();) {
-        const Character next = decode(text.substr(place));
+        const Utf8Character next = first_utf8(text.substr(place));
         if (next.length > 0 && !is_xml_character(next.code)) return std::nullopt;
         place += std::max<std::size_t>(next.length, 1);
         if (next.length > 0) continue;

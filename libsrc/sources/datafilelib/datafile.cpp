@@ -85,7 +85,7 @@ bool read_profile(RasterDescription& raster, const char* side_file) {
     form.read("NrOfPixelsPerLine", raster.NrOfPixelsPerLine);
     form.read("NrOfLinesPerImage", raster.NrOfLinesPerImage);
     raster.CellType = code_of(form.read("CellType"));
-    // Deliberate: any other text, in any other letter case, means little-endian.
+    // Any other text, in any other letter case, means little-endian.
     raster.ByteOrder = form.read("ByteOrder") == "MSBFirst" ? 1 : 0;
     return form.complete() && raster.CellType >= 0;
 }
@@ -240,7 +240,7 @@ int DataFile::open(int mode) {
 int DataFile::close() {
     if (!is_open()) return QUO_OK;
     quo::CallFrame frame{"DataFile::close", kSource};
-    // Deliberate: a file open for reading and writing drops what its buffer holds.
+    // What a file open for reading and writing has pending is dropped: there only seek() writes it.
     if (buffer_ && state_ == 1 && flushBuffer() != QUO_OK) return frame.fail(QUO_WRITE_FAILED, kWriteFailed);
     buffer_.reset();
     BufferSize = 0;
@@ -288,7 +288,7 @@ int DataFile::seekReading(int64_t offset, int whence) {
         cursor_ = static_cast<std::int32_t>(*within);
         return QUO_OK;
     }
-    // Deliberate: relative targets count from the buffer's start here, not from the cursor.
+    // Relative targets count from the buffer's start here, not from the cursor.
     if (!target || *target < 0) return QUO_REFUSED;
     position_ = *target;
     refill();

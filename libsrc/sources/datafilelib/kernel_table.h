@@ -1,21 +1,13 @@
 #ifndef QUO_KERNEL_TABLE_H
 #define QUO_KERNEL_TABLE_H
 
-#include <cstddef>
-
 #include "datafilelib/sample_kernels.h"
 
 namespace quo {
 
-/** One pair of types of one access, and its loop. */
-struct KernelRow {
-    SampleAccess access;
-    int file_type, memory_type;
-    SampleKernel kernel;
-};
+/** The loops by access, memory type and the file's cell type; null where an access does not convert the pair. */
 struct KernelTable {
-    const KernelRow* rows;
-    std::size_t count;
+    SampleKernel kernels[static_cast<int>(SampleAccess::kBlockWrite) + 1][kCellTypes][kCellTypes];
 };
 
 namespace kernels_any {

@@ -111,10 +111,17 @@ int copy_bytes(const RasterStream& from, AtomicFile& to) {
     if (!length) return QUO_READ_FAILED;
     TrackedBuffer<char> chunk{static_cast<std::size_t>(kChunk)};
     if (!chunk) return QUO_NO_MEMORY;
-    for (std::int64_t done = 0; done < *length; done += kChunk) {
-        const auto bytes = static_cast<std::size_t>(std::min(kChunk, *length - done));
-        if (from.read_at(done, chunk.data(), bytes).bytes != bytes) return QUO_READ_FAILED;
-        if (!to.write({chunk.data(), bytes})) return QUO_WRITE_FAILED;
+    const auto read = [&](std::int64_t place, char* to_piece, std::size_t size) {
+        return from.read_at(place, to_piece, size);
+    };
+    const auto write = [&](std::string_view piece) { return to.write(piece); };
+    switch (copy_pieces(*length, {chunk.data(), chunk.size()}, read, write)) {
+        case Copied::kWhole:
+            return QUO_OK;
+        case Copied::kNotRead:
+            return QUO_READ_FAILED;
+        case Copied::kNotWritten:
+            return QUO_WRITE_FAILED;
     }
     return QUO_OK;
 }

@@ -4,14 +4,10 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <cerrno>
 
 namespace quo {
 namespace {
-
-// The kernel moves at most 0x7ffff000 bytes at once.
-constexpr std::size_t kMostAtOnce = std::size_t{1} << 30;
 
 int flags_of(RasterStream::Mode mode) {
     switch (mode) {
@@ -25,22 +21,6 @@ int flags_of(RasterStream::Mode mode) {
             return O_RDWR;
     }
     return O_RDONLY;
-}
-
-// Repeats `step(done, left)` until everything is moved or a step moves nothing.
-template <typename Step>
-Transfer move_all(std::size_t size, Step step) {
-    std::size_t done = 0;
-    while (done < size) {
-        const ssize_t moved = step(done, std::min(size - done, kMostAtOnce));
-        if (moved < 0 && errno == EINTR) {
-            errno = 0;
-            continue;
-        }
-        if (moved <= 0) return {done, moved < 0};
-        done += static_cast<std::size_t>(moved);
-    }
-    return {done, false};
 }
 
 }  // namespace

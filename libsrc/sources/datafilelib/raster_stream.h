@@ -5,14 +5,9 @@
 #include <cstdint>
 #include <optional>
 
-namespace quo {
+#include "sarutillib/transfer.h"
 
-/** What a transfer moved, and whether it is short because the system refused the rest: at the end of the file it
- * does not, and the bytes beyond are known not to be there. */
-struct Transfer {
-    std::size_t bytes = 0;
-    bool refused = false;
-};
+namespace quo {
 
 /** An open raster file: whole transfers at 64-bit positions. Folders are refused. */
 class RasterStream {

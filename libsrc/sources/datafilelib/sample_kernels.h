@@ -23,6 +23,8 @@ enum class SampleAccess : unsigned char {
  * access does not convert this pair. */
 SampleKernel find_kernel(SampleAccess access, int file_type, int memory_type) noexcept;
 
+/** Cell types have the codes 0 to kCellTypes - 1. */
+inline constexpr int kCellTypes = 10;
 /** Bytes of a sample, 0 for a code that is not a cell type. */
 std::size_t sample_size(int cell_type) noexcept;
 bool is_complex_type(int cell_type) noexcept;

@@ -136,7 +136,7 @@ extern "C" void* calloc_ckerr(size_t count, size_t size) noexcept {
 extern "C" void free_ckerr(void* block) noexcept {
     // The system's free() will want the words below the block: they are fetched while the table is searched.
     if (block) __builtin_prefetch(static_cast<char*>(block) - kAlignment);
-    // Deliberate: while tracking is on, a block that is not in the table is neither freed nor reported.
+    // A block that is not in the table may have been freed already, with the call that owned it.
     if (call_stack.tracking && !tracked.remove(block)) return;
     if (block) release_block(block);
 }

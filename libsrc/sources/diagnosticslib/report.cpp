@@ -29,8 +29,8 @@ struct Channel {
 
 Channel report, log_file;
 
-// Deliberate: report and log share the title and the start time. Opening the log after the report moves the origin
-// of the report's elapsed times and replaces the title of its closing banner.
+// Report and log tell of one run and share its title and start time: opening the log after the report moves the
+// origin of the report's elapsed times and replaces the title of its closing banner.
 char shared_title[kTitleRoom];
 std::time_t shared_start;
 

@@ -7,23 +7,14 @@
 #include <cstdio>
 #include <cstring>
 
+#include "sarutillib/utf8.h"
+
 namespace quo {
 namespace {
 
-/** Bytes that a UTF-8 sequence begun by `lead` has; 1 for anything that begins none. */
-std::size_t sequence_length(unsigned char lead) noexcept {
-    if (lead < 0xC2 || lead > 0xF4) return 1;
-    if (lead >= 0xF0) return 4;
-    return lead >= 0xE0 ? 3 : 2;
-}
-
-bool continues_sequence(unsigned char byte) noexcept { return (byte & 0xC0) == 0x80; }
-
 /** Whether `text` begins with all bytes of a character of `length` bytes. */
 bool begins_whole(std::string_view text, std::size_t length) noexcept {
-    return text.size() >= length && std::ranges::all_of(text.substr(1, length - 1), [](char byte) {
-               return continues_sequence(static_cast<unsigned char>(byte));
-           });
+    return text.size() >= length && std::ranges::all_of(text.substr(1, length - 1), continues_utf8);
 }
 
 /** Length of a text cut to `length` bytes without the character that the cut splits. One that is not whole in the
@@ -31,9 +22,8 @@ bool begins_whole(std::string_view text, std::size_t length) noexcept {
 std::size_t whole_characters(std::string_view text, std::size_t length) noexcept {
     for (std::size_t back = 1; back <= std::min<std::size_t>(3, length); ++back) {
         const std::string_view last = text.substr(length - back);
-        const auto lead = static_cast<unsigned char>(last.front());
-        if (continues_sequence(lead)) continue;
-        const std::size_t wanted = sequence_length(lead);
+        if (continues_utf8(last.front())) continue;
+        const std::size_t wanted = utf8_length(last.front());
         return wanted > back && begins_whole(last, wanted) ? length - back : length;
     }
     return length;

@@ -16,6 +16,7 @@
 #include <utility>
 
 #include "sarutillib/bounded_text.h"
+#include "sarutillib/transfer.h"
 
 namespace quo {
 namespace {
@@ -29,14 +30,6 @@ constexpr mode_t kPermissions = 0777;  // set-user and set-group bits go, as the
 bool refuse(int error) noexcept {
     errno = error;
     return false;
-}
-
-/** Runs a system call again as long as a signal interrupts it. */
-template <typename Call>
-auto retried(Call call) noexcept {
-    auto result = call();
-    while (result < 0 && errno == EINTR) result = call();
-    return result;
 }
 
 /** The folder and the last name of a path. */
@@ -156,29 +149,32 @@ bool adopt(int file, const struct stat& old) noexcept {
 /** Calls `put(bytes, done)` with what is left of `bytes` until all are written. */
 template <typename Put>
 bool put_all(std::string_view bytes, Put put) noexcept {
-    std::size_t done = 0;
-    while (done < bytes.size()) {
-        const ssize_t more = retried([&] { return put(bytes.substr(done), static_cast<off_t>(done)); });
-        if (more < 0) return false;
-        if (more == 0) return refuse(ENOSPC);
-        done += static_cast<std::size_t>(more);
-    }
-    return true;
+    const Transfer moved = move_all(bytes.size(), [&](std::size_t done, std::size_t left) {
+        return put(bytes.substr(done, left), static_cast<off_t>(done));
+    });
+    if (moved.refused) return false;
+    return moved.bytes == bytes.size() || refuse(ENOSPC);
 }
 
 bool write_all(int file, std::string_view bytes) noexcept {
     return put_all(bytes, [=](std::string_view rest, off_t) { return ::write(file, rest.data(), rest.size()); });
 }
 
-/** Writes the whole of one file to where the other stands. */
-bool copy_content(int from, int to) {
-    std::string piece(std::size_t{1} << 20U, '\0');
-    for (off_t place = 0;;) {
-        const ssize_t got = retried([&] { return ::pread(from, piece.data(), piece.size(), place); });
-        if (got <= 0) return got == 0;
-        if (!write_all(to, {piece.data(), static_cast<std::size_t>(got)})) return false;
-        place += got;
-    }
+Transfer read_all(int file, std::int64_t place, char* to, std::size_t size) noexcept {
+    return move_all(size, [=](std::size_t done, std::size_t left) {
+        return ::pread(file, to + done, left, place + static_cast<off_t>(done));
+    });
+}
+
+/** Writes the first `length` bytes of one file, which are all of it, to where the other stands. */
+bool copy_content(int from, std::int64_t length, int to) {
+    std::string room(std::size_t{1} << 20U, '\0');
+    const auto read = [=](std::int64_t place, char* piece, std::size_t size) {
+        return read_all(from, place, piece, size);
+    };
+    const auto write = [=](std::string_view piece) { return write_all(to, piece); };
+    errno = 0;
+    return copy_pieces(length, room, read, write) == Copied::kWhole || refuse(errno != 0 ? errno : EIO);
 }
 
 /** Overwrites an open file. Room for what it grows by is taken before its first byte changes. */
@@ -186,11 +182,12 @@ bool overwrite_content(int from, int to) {
     struct stat source {
     }, target{};
     if (::fstat(from, &source) != 0 || ::fstat(to, &target) != 0) return false;
-    if (!S_ISREG(target.st_mode)) return copy_content(from, to);
+    if (!S_ISREG(target.st_mode)) return copy_content(from, source.st_size, to);
     const off_t grows_by = source.st_size - target.st_size;
     const auto take_room = [=] { return ::fallocate(to, FALLOC_FL_KEEP_SIZE, target.st_size, grows_by); };
     if (grows_by > 0 && retried(take_room) != 0 && errno != EOPNOTSUPP && errno != ENOSYS) return false;
-    return copy_content(from, to) && retried([&] { return ::ftruncate(to, source.st_size); }) == 0 &&
+    return copy_content(from, source.st_size, to) &&
+           retried([&] { return ::ftruncate(to, source.st_size); }) == 0 &&
            retried([&] { return ::fsync(to); }) == 0;
 }
 
@@ -400,7 +397,7 @@ bool AtomicFile::copy_old(const std::string& second, const struct stat& old) {
     Descriptor to{::openat(folder, second.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, 0600)};
     if (!to) return false;
     (void)lock(to.get());
-    if (!adopt(to.get(), old) || !copy_content(from.get(), to.get())) {
+    if (!adopt(to.get(), old) || !copy_content(from.get(), old.st_size, to.get())) {
         const int error = errno;
         (void)::unlinkat(folder, second.c_str(), 0);
         return refuse(error);

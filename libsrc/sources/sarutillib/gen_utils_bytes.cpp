@@ -141,8 +141,8 @@ int get_endian(void* buffer, std::int64_t count, int element_size, int swap) noe
             swp8(buffer, count);
             return 0;
         case 16:
-            swp_any(buffer, count, 16);
-            return 0;  // deliberate: a count where a length in bytes is expected
+            swp_any(buffer, count, 16);  // takes a length in bytes, so that count / 16 elements are swapped
+            return 0;
         default:
             return -1;
     }

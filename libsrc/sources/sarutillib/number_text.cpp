@@ -3,10 +3,7 @@
 #include <algorithm>
 #include <charconv>
 #include <cmath>
-#include <cstdlib>
 #include <limits>
-
-#include "sarutillib/number_text_scale.h"
 
 namespace quo {
 namespace {
@@ -24,49 +21,10 @@ NumberText text_of(How... how) noexcept {
     return text;
 }
 
-/** Writes "e+05": a sign and at least two digits. */
-char* put_exponent(char* at, int exponent) noexcept {
-    *at++ = 'e';
-    *at++ = exponent < 0 ? '-' : '+';
-    const int magnitude = std::abs(exponent);
-    if (magnitude < 10) *at++ = '0';
-    return std::to_chars(at, at + 3, magnitude).ptr;
-}
-
-/** Writes digits and point of d.ddd * 10^exponent in printf's "%g" way: without final zeros, and with an exponent
- * when the number is below 1e-4 or has more places than `precision`. */
-NumberText general_text(DecimalDigits number, int precision, bool negative) noexcept {
-    char digits[kNumberRoom];
-    auto count = std::to_chars(digits, digits + sizeof digits, number.digits).ptr - digits;
-    while (count > 1 && digits[count - 1] == '0') --count;
-
-    NumberText text;
-    char* at = text.data;
-    if (negative) *at++ = '-';
-    const auto put = [&](const char* from, std::ptrdiff_t length) { at = std::copy_n(from, length, at); };
-    const auto put_zeros = [&](std::ptrdiff_t length) { at = std::fill_n(at, length, '0'); };
-    const bool scientific = number.exponent < -4 || number.exponent >= precision;
-    const std::ptrdiff_t before_point = scientific ? 1 : std::max(number.exponent + 1, 0);
-
-    put(digits, std::min(before_point, count));
-    put_zeros(before_point - std::min(before_point, count));
-    if (before_point == 0) put_zeros(1);
-    if (count > before_point) {
-        *at++ = '.';
-        if (!scientific) put_zeros(-1 - number.exponent);
-        put(digits + before_point, count - before_point);
-    }
-    if (scientific) at = put_exponent(at, number.exponent);
-    *at = '\0';
-    text.size = static_cast<std::size_t>(at - text.data);
-    return text;
-}
-
 bool is_space(char c) noexcept { return c == ' ' || (c >= '\t' && c <= '\r'); }
 bool is_digit(char c) noexcept { return c >= '0' && c <= '9'; }
 /** Letters in lower case; no other character becomes a letter. */
 char lower(char c) noexcept { return static_cast<char>(c | 0x20); }
-bool is_letter(char c) noexcept { return lower(c) >= 'a' && lower(c) <= 'z'; }
 bool is_hex_digit(char c) noexcept { return is_digit(c) || (lower(c) >= 'a' && lower(c) <= 'f'); }
 
 /** What stands before the digits of a number: where they begin, and whether a minus comes first. */
@@ -99,37 +57,6 @@ Exponent scan_exponent(const char* at, const char* end) noexcept {
     for (; digit != end && is_digit(*digit); ++digit)
         if (value < kEnough) value = 10 * value + (*digit - '0');
     return {value * (1 - 2 * static_cast<int>(lead.negative)), digit == lead.begin ? at : digit};
-}
-
-/** An unsigned decimal number, digits * 10^exponent, and the characters it took. */
-struct Decimal {
-    std::uint64_t digits;
-    std::int64_t exponent;
-    std::size_t length;
-};
-
-/** Reads the plain cases: up to 19 digits and no letter but the exponent's mark. For all others length is 0. */
-Decimal scan_decimal(const char* begin, const char* end) noexcept {
-    constexpr std::ptrdiff_t kMostDigitsRead = std::numeric_limits<std::uint64_t>::digits10;
-    std::uint64_t digits = 0;
-    const char* at = begin;
-    for (; at != end && is_digit(*at); ++at) digits = 10 * digits + static_cast<unsigned>(*at - '0');
-    std::ptrdiff_t count = at - begin, decimals = 0;
-    if (at != end && *at == '.') {
-        const char* const point = at;
-        for (++at; at != end && is_digit(*at); ++at) digits = 10 * digits + static_cast<unsigned>(*at - '0');
-        decimals = at - point - 1;
-        count += decimals;
-    }
-    if (count == 0 || count > kMostDigitsRead) return {0, 0, 0};
-    std::int64_t exponent = -decimals;
-    if (at != end && is_letter(*at)) {
-        const auto [value, stop] = scan_exponent(at, end);
-        if (lower(*at) != 'e' || stop == at) return {0, 0, 0};
-        exponent += value;
-        at = stop;
-    }
-    return {digits, exponent, static_cast<std::size_t>(at - begin)};
 }
 
 /** Whether an unsigned number too large or too small for a double is too large. `begin` to `end` holds just that
@@ -168,27 +95,17 @@ Scanned<double> scan_hexadecimal(const char* begin, const char* end) noexcept {
     return length > 0 ? Scanned<double>{value, length + 2} : Scanned<double>{0.0, 1};
 }
 
-/** Reads an unsigned number in any of strtod's forms. Kept out of line: most numbers take the short way. */
-[[gnu::noinline]] Scanned<double> scan_any_form(const char* begin, const char* end) noexcept {
-    if (begin == end || *begin == '-') return {0.0, 0};
+/** Reads an unsigned number in any of strtod's forms. */
+Scanned<double> scan_unsigned(const char* begin, const char* end) noexcept {
+    if (begin == end || *begin == '-') return {0.0, 0};  // from_chars would take a second sign
     if (end - begin > 2 && begin[0] == '0' && lower(begin[1]) == 'x') return scan_hexadecimal(begin + 2, end);
     return scan_magnitude(begin, end, std::chars_format::general);
-}
-
-Scanned<double> scan_unsigned(const char* begin, const char* end) noexcept {
-    const Decimal decimal = scan_decimal(begin, end);
-    if (decimal.length > 0)
-        if (const auto value = scale_by_ten(decimal.digits, decimal.exponent)) return {*value, decimal.length};
-    return scan_any_form(begin, end);
 }
 
 }  // namespace
 
 NumberText format_general(double value, int precision) noexcept {
     const int digits = precision < 0 ? kPrintfDefaultPrecision : std::clamp(precision, 1, kMostDigits);
-    if (digits <= kMostFirstDigits && std::isnormal(value))
-        if (const auto found = first_digits(std::fabs(value), digits))
-            return general_text(*found, digits, std::signbit(value));
     return text_of(value, std::chars_format::general, digits);
 }
 

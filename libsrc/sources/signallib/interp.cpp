@@ -36,7 +36,7 @@ struct Padding {
     }
 };
 
-/** Deliberate: halved once for every row of the image, though only the first row is treated at all. */
+/** Halved once for every row of the image, though only the first row is treated at all. */
 void mirror_first_row(const Padding& padding, int rows, fcomplex* row) {
     fcomplex value = row[padding.nyquist()];
     for (int k = 0; k < rows && value != fcomplex{}; ++k) value *= 0.5F;
