@@ -4,7 +4,7 @@
 #include "diagnosticslib/call_frame.h"
 #include "quo_base/interp_orb.h"
 #include "ratio_reporter.h"
-#include "sarutillib/geometry_kernels.h"
+#include "sarutillib/geometry/geometry_kernels.h"
 #include "support/scenes.h"
 
 // What geolocation on an orbit costs per point, beside the same kernels without frame, checks and choice of the

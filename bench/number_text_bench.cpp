@@ -13,7 +13,7 @@
 #include <vector>
 
 #include "ratio_reporter.h"
-#include "sarutillib/number_text.h"
+#include "sarutillib/ground/number_text.h"
 
 namespace {
 

@@ -5,7 +5,7 @@
 #include "quo_base/gr_pt.h"
 #include "quo_base/interp_orb.h"
 #include "ratio_reporter.h"
-#include "sarutillib/geometry_kernels.h"
+#include "sarutillib/geometry/geometry_kernels.h"
 #include "support/geometry.h"
 
 namespace {

@@ -16,7 +16,7 @@
 
 #include "quo_base/profile.h"
 #include "ratio_reporter.h"
-#include "sarutillib/file_io.h"
+#include "sarutillib/ground/file_io.h"
 
 namespace {
 

@@ -18,7 +18,7 @@
 #include "quorelxmllib/field_table.h"
 #include "quorelxmllib/header_session.h"
 #include "ratio_reporter.h"
-#include "sarutillib/number_text.h"
+#include "sarutillib/ground/number_text.h"
 #include "temporary_folder.h"
 
 namespace {

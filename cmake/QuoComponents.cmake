@@ -22,17 +22,41 @@ if(QUO_BUILD_FUZZ)
     target_compile_options(quo_flags INTERFACE -fsanitize=fuzzer-no-link)
 endif()
 
-# quo_component(name SOURCES ... [DEPENDS component ...] [LINK library ...])
+# quo_component(name SOURCES ... [HEADERS public ...] [DEPENDS component ...] [LINK library ...]). Private headers are
+# included by folder, "sarutillib/ground/file_io.h", and found for the component itself and all that it stands on: a
+# folder for each component has a link to its sources. So an include up the house does not compile.
 function(quo_component name)
-    cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "SOURCES;DEPENDS;LINK")
+    cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "SOURCES;HEADERS;DEPENDS;LINK")
     set(target quo_${name})
+    file(RELATIVE_PATH folder "${PROJECT_SOURCE_DIR}" "${CMAKE_CURRENT_SOURCE_DIR}")
+    string(REGEX REPLACE "^libsrc/[a-z]+/" "" room "${folder}")
+    set(rooms "${PROJECT_BINARY_DIR}/rooms/${name}")
+    cmake_path(GET room PARENT_PATH above)
+    file(MAKE_DIRECTORY "${rooms}/${above}")
+    file(CREATE_LINK "${CMAKE_CURRENT_SOURCE_DIR}" "${rooms}/${room}" SYMBOLIC)
+
     add_library(${target} OBJECT ${arg_SOURCES})
     target_compile_definitions(${target} PRIVATE QUO_BASE_BUILD)
-    target_include_directories(${target} PUBLIC
-        "${PROJECT_SOURCE_DIR}/include" "${PROJECT_SOURCE_DIR}/libsrc/sources" "${PROJECT_SOURCE_DIR}/libsrc/cppsources")
-    target_link_libraries(${target} PRIVATE quo_flags ${arg_LINK})
-    set_target_properties(${target} PROPERTIES QUO_DEPENDS "${arg_DEPENDS}" QUO_LINK "${arg_LINK}")
+    target_include_directories(${target} PUBLIC "${PROJECT_SOURCE_DIR}/include" "${rooms}")
+    list(TRANSFORM arg_DEPENDS PREPEND quo_ OUTPUT_VARIABLE below)
+    target_link_libraries(${target} PUBLIC ${below} PRIVATE quo_flags ${arg_LINK})
+    set_target_properties(${target} PROPERTIES
+        QUO_FOLDER "${folder}" QUO_HEADERS "${arg_HEADERS}" QUO_DEPENDS "${arg_DEPENDS}" QUO_LINK "${arg_LINK}")
     set_property(GLOBAL APPEND PROPERTY QUO_COMPONENTS ${name})
+endfunction()
+
+# Writes what scripts/check_includes.sh needs to know: a line a component, with its folder, its public headers and the
+# components that it stands on.
+function(quo_list_components file)
+    get_property(components GLOBAL PROPERTY QUO_COMPONENTS)
+    set(lines "")
+    foreach(name IN LISTS components)
+        get_target_property(folder quo_${name} QUO_FOLDER)
+        get_target_property(headers quo_${name} QUO_HEADERS)
+        quo_closure(below ${name})
+        string(APPEND lines "${name}|${folder}|${headers}|${below}\n")
+    endforeach()
+    file(WRITE "${file}" "${lines}")
 endfunction()
 
 # Sets `out` to the named components and everything they stand on.

@@ -7,7 +7,7 @@
 #include <utility>
 #include <vector>
 
-#include "sarutillib/bounded_text.h"
+#include "sarutillib/ground/bounded_text.h"
 #include "support/header_object_suite.h"
 
 namespace {

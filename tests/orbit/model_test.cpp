@@ -5,7 +5,7 @@
 #include <memory>
 #include <utility>
 
-#include "generalSAR/orbit_model.h"
+#include "generalSAR/orbit/orbit_model.h"
 #include "orbit/made_orbits.h"
 #include "quo_base/interp_orb.h"
 #include "support/diagnostics.h"

@@ -11,7 +11,7 @@
 
 #include "header_files.h"
 #include "quorelxmllib/field_table.h"
-#include "sarutillib/file_io.h"
+#include "sarutillib/ground/file_io.h"
 #include "shelf.h"
 
 namespace {

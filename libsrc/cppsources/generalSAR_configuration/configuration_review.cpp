@@ -10,7 +10,7 @@
 #include "quo_base/generalSAR_configuration.h"
 #include "quorelxmllib/header_document.h"
 #include "quorelxmllib/header_session.h"
-#include "sarutillib/number_text.h"
+#include "sarutillib/ground/number_text.h"
 
 namespace {
 

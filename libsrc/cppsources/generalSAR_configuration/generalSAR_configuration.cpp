@@ -4,7 +4,7 @@
 #include <typeinfo>
 
 #include "diagnosticslib/call_frame.h"
-#include "generalSAR/readable_file.h"
+#include "generalSAR/container/readable_file.h"
 #include "quorelxmllib/field_table.h"
 #include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_session.h"

@@ -7,7 +7,7 @@
 
 #include "quo_base/gen_utils.h"
 #include "quo_base/quorelxml_v2.h"
-#include "sarutillib/number_text.h"
+#include "sarutillib/ground/number_text.h"
 
 namespace {
 

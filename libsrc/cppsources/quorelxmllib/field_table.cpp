@@ -6,8 +6,8 @@
 #include "profilelib/profile_look.h"
 #include "quo_base/ckerr.h"
 #include "quo_base/profile.h"
-#include "sarutillib/checked_size.h"
-#include "sarutillib/file_io.h"
+#include "sarutillib/ground/checked_size.h"
+#include "sarutillib/ground/file_io.h"
 
 namespace quo {
 namespace {

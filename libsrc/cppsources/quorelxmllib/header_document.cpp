@@ -11,8 +11,8 @@
 #include "quorelxmllib/header_parser.h"
 #include "quorelxmllib/header_source.h"
 #include "quorelxmllib/header_writer.h"
-#include "sarutillib/file_io.h"
-#include "sarutillib/number_text.h"
+#include "sarutillib/ground/file_io.h"
+#include "sarutillib/ground/number_text.h"
 
 namespace quo {
 namespace {

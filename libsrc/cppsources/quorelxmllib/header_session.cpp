@@ -9,7 +9,7 @@
 #include "quo_base/quorelxml_v2.h"
 #include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_document.h"
-#include "sarutillib/bounded_text.h"
+#include "sarutillib/ground/bounded_text.h"
 
 namespace quo {
 namespace {

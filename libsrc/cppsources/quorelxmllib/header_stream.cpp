@@ -6,7 +6,7 @@
 
 #include "quo_base/api.h"
 #include "quorelxmllib/header_parser.h"
-#include "sarutillib/number_text.h"
+#include "sarutillib/ground/number_text.h"
 
 namespace quo {
 namespace {

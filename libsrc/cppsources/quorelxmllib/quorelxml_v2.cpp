@@ -15,8 +15,8 @@
 #include "quorelxmllib/header_stream.h"
 #include "quorelxmllib/legacy_list.h"
 #include "quorelxmllib/xml_text.h"
-#include "sarutillib/bounded_text.h"
-#include "sarutillib/number_text.h"
+#include "sarutillib/ground/bounded_text.h"
+#include "sarutillib/ground/number_text.h"
 
 using quo::CallFrame;
 using quo::guarded;

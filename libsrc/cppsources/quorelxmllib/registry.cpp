@@ -10,7 +10,7 @@
 #include "quorelxmllib/header_document.h"
 #include "quorelxmllib/header_session.h"
 #include "quorelxmllib/xml_text.h"
-#include "sarutillib/bounded_text.h"
+#include "sarutillib/ground/bounded_text.h"
 
 using quo::CallFrame;
 using quo::guarded;

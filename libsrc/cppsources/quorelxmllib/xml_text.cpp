@@ -6,7 +6,7 @@
 #include <cstddef>
 #include <cstdint>
 
-#include "sarutillib/utf8.h"
+#include "sarutillib/ground/utf8.h"
 
 namespace quo {
 namespace {

@@ -6,7 +6,7 @@
 #include "diagnosticslib/call_frame.h"
 #include "quorelxmllib/field_table.h"
 #include "roilib/rounding.h"
-#include "sarutillib/bounded_text.h"
+#include "sarutillib/ground/bounded_text.h"
 
 namespace {
 

@@ -12,9 +12,9 @@
 #include "datafilelib/sample_kernels.h"
 #include "diagnosticslib/report.h"
 #include "quo_base/datafile.h"
-#include "sarutillib/bounded_text.h"
-#include "sarutillib/checked_size.h"
-#include "sarutillib/file_io.h"
+#include "sarutillib/ground/bounded_text.h"
+#include "sarutillib/ground/checked_size.h"
+#include "sarutillib/ground/file_io.h"
 
 namespace {
 

@@ -20,9 +20,9 @@
 #include "quorelxmllib/field_table.h"
 #include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_session.h"
-#include "sarutillib/bounded_text.h"
-#include "sarutillib/checked_size.h"
-#include "sarutillib/file_io.h"
+#include "sarutillib/ground/bounded_text.h"
+#include "sarutillib/ground/checked_size.h"
+#include "sarutillib/ground/file_io.h"
 
 namespace {
 

@@ -9,7 +9,7 @@
 #include <cstring>
 
 #include "diagnosticslib/call_frame.h"
-#include "sarutillib/checked_size.h"
+#include "sarutillib/ground/checked_size.h"
 
 namespace quo {
 namespace {

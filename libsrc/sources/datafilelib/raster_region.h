@@ -9,7 +9,7 @@
 
 #include "datafilelib/raster_stream.h"
 #include "datafilelib/sample_kernels.h"
-#include "sarutillib/file_io.h"
+#include "sarutillib/ground/file_io.h"
 
 namespace quo {
 

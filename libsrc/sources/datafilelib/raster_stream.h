@@ -5,7 +5,7 @@
 #include <cstdint>
 #include <optional>
 
-#include "sarutillib/transfer.h"
+#include "sarutillib/ground/transfer.h"
 
 namespace quo {
 

@@ -8,9 +8,9 @@
 
 #include "diagnosticslib/call_frame.h"
 #include "diagnosticslib/errno_kept.h"
-#include "sarutillib/bounded_text.h"
-#include "sarutillib/checked_size.h"
-#include "sarutillib/file_io.h"
+#include "sarutillib/ground/bounded_text.h"
+#include "sarutillib/ground/checked_size.h"
+#include "sarutillib/ground/file_io.h"
 
 namespace {
 

@@ -13,8 +13,8 @@
 #include "diagnosticslib/errno_kept.h"
 #include "diagnosticslib/report.h"
 #include "diagnosticslib/tracking_table.h"
-#include "sarutillib/bounded_text.h"
-#include "sarutillib/checked_size.h"
+#include "sarutillib/ground/bounded_text.h"
+#include "sarutillib/ground/checked_size.h"
 
 quo::CallStack quo::call_stack;
 

@@ -8,8 +8,8 @@
 #include <cstring>
 
 #include "quo_base/ckerr.h"
-#include "sarutillib/bounded_text.h"
-#include "sarutillib/file_io.h"
+#include "sarutillib/ground/bounded_text.h"
+#include "sarutillib/ground/file_io.h"
 
 namespace {
 

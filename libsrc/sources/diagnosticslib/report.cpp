@@ -10,7 +10,7 @@
 #include "diagnosticslib/call_stack.h"
 #include "diagnosticslib/errno_kept.h"
 #include "quo_base/ckerr.h"
-#include "sarutillib/bounded_text.h"
+#include "sarutillib/ground/bounded_text.h"
 
 namespace {
 

@@ -2,7 +2,7 @@
 #define QUO_SAVED_IN_PLACE_H
 
 #include "quo_base/ckerr.h"
-#include "sarutillib/file_io.h"
+#include "sarutillib/ground/file_io.h"
 
 namespace quo {
 

@@ -4,7 +4,7 @@
 #include <bit>
 #include <iterator>
 
-#include "sarutillib/bounded_text.h"
+#include "sarutillib/ground/bounded_text.h"
 
 namespace quo {
 

@@ -9,7 +9,7 @@
 #include "diagnosticslib/call_frame.h"
 #include "matrixlib/matrix_kernels.h"
 #include "quo_base/gr_pt.h"
-#include "sarutillib/checked_size.h"
+#include "sarutillib/ground/checked_size.h"
 
 namespace quo {
 

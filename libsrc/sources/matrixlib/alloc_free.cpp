@@ -5,7 +5,7 @@
 #include <optional>
 
 #include "diagnosticslib/call_frame.h"
-#include "sarutillib/checked_size.h"
+#include "sarutillib/ground/checked_size.h"
 
 namespace {
 

@@ -9,8 +9,8 @@
 #include "diagnosticslib/call_frame.h"
 #include "profilelib/out_of_memory.h"
 #include "quo_base/profile.h"
-#include "sarutillib/bounded_text.h"
-#include "sarutillib/number_text.h"
+#include "sarutillib/ground/bounded_text.h"
+#include "sarutillib/ground/number_text.h"
 
 namespace quo {
 namespace {

@@ -3,8 +3,8 @@
 #include <cstdlib>
 
 #include "quo_base/profile.h"
-#include "sarutillib/bounded_text.h"
-#include "sarutillib/number_text.h"
+#include "sarutillib/ground/bounded_text.h"
+#include "sarutillib/ground/number_text.h"
 
 namespace {
 

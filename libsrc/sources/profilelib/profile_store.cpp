@@ -10,7 +10,7 @@
 #include "profilelib/out_of_memory.h"
 #include "profilelib/profile_look.h"
 #include "quo_base/profile.h"
-#include "sarutillib/file_io.h"
+#include "sarutillib/ground/file_io.h"
 
 namespace quo {
 namespace {

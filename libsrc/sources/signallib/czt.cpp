@@ -6,7 +6,7 @@
 #include <new>
 
 #include "quo_base/fft.h"
-#include "sarutillib/checked_size.h"
+#include "sarutillib/ground/checked_size.h"
 #include "signallib/memory_room.h"
 
 namespace {

@@ -8,7 +8,7 @@
 #include <optional>
 
 #include "diagnosticslib/errno_kept.h"
-#include "sarutillib/checked_size.h"
+#include "sarutillib/ground/checked_size.h"
 #include "signallib/image_size.h"
 #include "signallib/plan_store.h"
 

@@ -7,7 +7,7 @@
 #include <string>
 
 #include "diagnosticslib/errno_kept.h"
-#include "sarutillib/bounded_text.h"
+#include "sarutillib/ground/bounded_text.h"
 
 #if defined(__x86_64__) || defined(__i386__)
 #include <cpuid.h>

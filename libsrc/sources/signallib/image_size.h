@@ -3,7 +3,7 @@
 
 #include <cstddef>
 
-#include "sarutillib/checked_size.h"
+#include "sarutillib/ground/checked_size.h"
 
 namespace quo {
 

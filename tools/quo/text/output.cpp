@@ -8,7 +8,7 @@
 
 #include "failure.h"
 #include "interrupt.h"
-#include "sarutillib/file_io.h"
+#include "sarutillib/ground/file_io.h"
 #include "shown.h"
 
 namespace tool {

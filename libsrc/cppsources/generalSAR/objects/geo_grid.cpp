@@ -1,0 +1,93 @@
+#include "quo_base/geo_grid.h"
+
+#include <string>
+
+#include "diagnosticslib/call_frame.h"
+#include "generalSAR/objects/raster_name.h"
+#include "quorelxmllib/field_table.h"
+#include "quorelxmllib/guarded.h"
+#include "quorelxmllib/header_session.h"
+#include "sarutillib/ground/bounded_text.h"
+
+namespace {
+
+constexpr const char* kSource = "generalSAR";
+constexpr const char* kProfileSection = "GeoGridSize";
+constexpr const char* kRoiSection = "ROI";
+
+using Obj = geoCoords_Obj;
+constexpr quo::FieldTable kTable{"GroundCornersPoints", QUO_FIELD(EastingGridSize), QUO_FIELD(NorthingGridSize)};
+
+struct NamedPoint {
+    const char* name;
+    geopoint Obj::*point;
+};
+constexpr NamedPoint kPoints[] = {{"NorthWest", &Obj::NorthWest},
+                                  {"NorthEast", &Obj::NorthEast},
+                                  {"SouthWest", &Obj::SouthWest},
+                                  {"SouthEast", &Obj::SouthEast},
+                                  {"Center", &Obj::Center}};
+
+}  // namespace
+
+QUO_RECORD(geoCoords_Obj, kTable)
+
+int Obj::clone(geoCoords_Obj* to) const {
+    for (const auto& [name, point] : kPoints) (this->*point).clone(&(to->*point));
+    return kTable.copy(*this, *to);
+}
+
+int Obj::writehdr(const char* file) {
+    quo::CallFrame frame{"geoCoords_Obj::writehdr", kSource};
+    return quo::guarded(frame, [&] {
+        quo::JoinedSession session{file};
+        if (const int status = writeAuxiliaryFile(file, 1, kTable.section())) return frame.callee(status);
+        for (const auto& [name, point] : kPoints)
+            if (const int status = (this->*point).writehdr(file, name)) return frame.callee(status);
+        if (const int status = session.commit()) return frame.callee(status);
+        return frame.success();
+    });
+}
+
+int Obj::readhdr(const char* file) {
+    quo::CallFrame frame{"geoCoords_Obj::readhdr", kSource};
+    return quo::guarded(frame, [&] {
+        const quo::JoinedSession session{file};
+        if (!readAuxiliaryFile(file, 1, kTable.section()))
+            if (const int status = kTable.of(*this).read_profile(file, kProfileSection))
+                return frame.silent(status);
+        for (const auto& [name, point] : kPoints)
+            if (const int status = (this->*point).readhdr(file, name)) return frame.callee(status);
+        return frame.success();
+    });
+}
+
+int GSRoi_Obj::readhdr(const char* file) { return Roi.read_roi(file, kRoiSection); }
+int GSRoi_Obj::writehdr(const char* file) { return Roi.write_roi(file, kRoiSection); }
+int GSRoi_Obj::clone(GSRoi_Obj* to) const { return Roi.clone(&to->Roi); }
+
+int GSDataFile_Obj::readhdr(const char* file) {
+    quo::CallFrame frame{"GSDataFile_Obj::readhdr", kSource};
+    return quo::guarded(frame, [&] {
+        const auto raster = quo::raster_of_header(quo::text_or_empty(file));
+        if (raster && File.read_hdr(raster->c_str()) == QUO_NO_MEMORY) return frame.callee(QUO_NO_MEMORY);
+        return frame.success();  // whatever else the raster says: a product always has this entry
+    });
+}
+
+int GSDataFile_Obj::writehdr(const char* file) {
+    quo::CallFrame frame{"GSDataFile_Obj::writehdr", kSource};
+    const int status = quo::guarded(frame, [&] {
+        const auto raster = quo::raster_of_header(quo::text_or_empty(file));
+        const std::string kept = File.FileName;
+        if (!raster || File.setFilename(raster->c_str()) != QUO_OK) return frame.success();
+        const int written = File.write_hdr();
+        File.setFilename(kept.c_str());
+        return written == QUO_NO_MEMORY ? frame.silent(written) : frame.success();
+    });
+    // A product without its data file would be neither the old one nor the new one.
+    if (status != QUO_OK) quo::HeaderSession::fail_all(status);
+    return QUO_OK;  // a header is written without its raster, too: the outcome stands in the report alone
+}
+
+int GSDataFile_Obj::clone(GSDataFile_Obj* to) const { return to->File.clone(&File); }

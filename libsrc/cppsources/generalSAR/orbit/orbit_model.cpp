@@ -1,0 +1,307 @@
+#include "generalSAR/orbit/orbit_model.h"
+
+#include <algorithm>
+#include <cmath>
+#include <limits>
+#include <new>
+#include <utility>
+
+#include "quo_base/interp_orb.h"
+
+namespace quo {
+namespace {
+
+// A run is kept from this many spacings after its first vector to this many; beyond, another one is closer.
+constexpr double kKeepFrom = 0.6, kKeepUntil = 3.4;
+constexpr double kEndTolerance_s = 1e-4;
+
+void difference(const double from[3], const double to[3], double time_s, double velocity_m_s[3]) noexcept {
+    for (int axis = 0; axis < 3; ++axis) velocity_m_s[axis] = (to[axis] - from[axis]) / time_s;
+}
+
+}  // namespace
+
+void along_track_rotation(const double v[3], double R[9], double* speed) noexcept {
+    // Sines and cosines of yaw and pitch straight from the components: the angles lie within a quarter turn of 0.
+    const double sign = v[0] < 0.0 ? -1.0 : 1.0;
+    const double level = std::hypot(v[0], v[1]), length = std::hypot(v[0], v[1], v[2]);
+    const double cos_yaw = level > 0.0 ? sign * v[0] / level : 1.0;
+    const double sin_yaw = level > 0.0 ? -sign * v[1] / level : 0.0;
+    const double cos_pitch = length > 0.0 ? level / length : 1.0;
+    const double sin_pitch = length > 0.0 ? -sign * v[2] / length : 0.0;
+    const double rows[9] = {cos_yaw * cos_pitch,  sin_yaw, sin_pitch * cos_yaw,   //
+                            -sin_yaw * cos_pitch, cos_yaw, -sin_yaw * sin_pitch,  //
+                            -sin_pitch,           0.0,     cos_pitch};
+    std::copy_n(rows, 9, R);
+    *speed = sign * length;
+}
+
+StraightFlight StraightFlight::of(const double velocity_m_s[3]) noexcept {
+    double R[9], speed = 0.0;
+    along_track_rotation(velocity_m_s, R, &speed);
+    return {{R[0], R[3], R[6]}, speed, speed != 0.0 ? 1.0 / speed : 0.0};
+}
+
+std::unique_ptr<OrbitModel> OrbitModel::create(std::int32_t vectors) noexcept {
+    const std::int32_t count = vectors - kRunVectors + 1;
+    std::unique_ptr<OrbitRun[]> runs{new (std::nothrow) OrbitRun[static_cast<std::size_t>(count)]};
+    if (!runs) return nullptr;
+    return std::unique_ptr<OrbitModel>{new (std::nothrow) OrbitModel{std::move(runs), count}};
+}
+
+void OrbitModel::copy(const OrbitModel& other) noexcept {
+    static_cast<OrbitModelValues&>(*this) = static_cast<const OrbitModelValues&>(other);
+    std::copy_n(other.runs_.get(), runs_count_, runs_.get());
+}
+
+int OrbitModel::build(const StateVectors& states, double t0) noexcept {
+    ready_ = false;
+    resampling_m_ = 0.0;
+    t0_ = t0;
+    dt_ = states.spacing_s;
+    if (const int status = fit_runs(states)) return status;
+    take(0);
+    if (const int status = fit_whole(states)) return status;
+    switches_ = 0;
+    ready_ = true;
+    return QUO_OK;
+}
+
+int OrbitModel::fit_runs(const StateVectors& states) noexcept {
+    for (std::int32_t k = 0; k < runs_count_; ++k) {
+        OrbitRun& run = runs_[static_cast<std::size_t>(k)];
+        if (const int status =
+                orb_interp(0.0, dt_, states.position(k), states.velocity(k), kRunVectors, run.x, run.y, run.z))
+            return status;
+        double velocity[3];
+        difference(states.position(k), states.position(k + kRunVectors - 1), (kRunVectors - 1) * dt_, velocity);
+        run.chord = StraightFlight::of(velocity);
+    }
+    return QUO_OK;
+}
+
+int OrbitModel::fit_whole(const StateVectors& states) noexcept {
+    const double step = length() * 0.25;
+    double positions[3 * kRunVectors], velocities[3 * kRunVectors];
+    for (int i = 0; i < kRunVectors; ++i) {
+        const double t = t0_ + i * step;
+        const OrbitSegment curve = select(t).curve();
+        store(orbit_position(curve, t - tc_), positions + 3 * i);
+        store(orbit_velocity(curve, t - tc_), velocities + 3 * i);
+    }
+    double velocity[3];
+    difference(states.position(0), states.position(vectors() - 1), length(), velocity);
+    mean_ = StraightFlight::of(velocity);
+    arc_rad_ = std::abs(run(0).chord.speed_m_s) * length() / norm(run(0).start());
+    return orb_interp(0.0, step, positions, velocities, kRunVectors, coarse_x_, coarse_y_, coarse_z_);
+}
+
+void OrbitModel::take(std::int32_t k) noexcept {
+    if (k != current_) ++switches_;
+    current_ = k;
+    tc_ = t0_ + k * dt_;
+    earliest_ = tc_ + kKeepFrom * dt_;
+    latest_ = tc_ + kKeepUntil * dt_;
+}
+
+// Where t left the run through its early edge, the new one ends a little after t, otherwise it starts
+// a little before, so that a sweep in either direction can go on in it for as long as possible.
+void OrbitModel::choose(double t) noexcept {
+    const std::int32_t last = runs_count_ - 1;
+    const double u = t - t0_;
+    double k = 0.0;
+    if (u > length())
+        k = last;
+    else if (u >= 0.0 && std::abs(t - tc_) < kKeepFrom * dt_)
+        k = std::ceil((u + kKeepFrom * dt_) / dt_) - 4.0;
+    else if (u >= 0.0)
+        k = std::floor((u - kKeepFrom * dt_) / dt_);
+    take(static_cast<std::int32_t>(std::clamp(k, 0.0, static_cast<double>(last))));
+}
+
+std::int32_t OrbitModel::centred_run(double spacings) const noexcept {
+    const double inside = std::clamp(spacings, 0.0, static_cast<double>(vectors()));
+    return std::clamp(static_cast<std::int32_t>(std::lround(inside)) - 2, 0, runs_count_ - 1);
+}
+
+bool OrbitModel::linear_guess(const Vec3& point, double rate_m_s, double turn, PointTimes* guess) const noexcept {
+    const double coarse = mean_.time_of(point - run(0).start(), rate_m_s, turn) / dt_;
+    if (!std::isfinite(coarse)) return false;
+    const std::int32_t k = centred_run(coarse);
+    const OrbitRun& here = run(k);
+    const Vec3 d = point - here.start();
+    const double time = here.chord.time_of(d, rate_m_s, turn);
+    if (!std::isfinite(time)) return false;
+    *guess = {k * dt_ + time, 2.0 / kLightSpeed * here.chord.distance(d, time)};
+    return true;
+}
+
+double OrbitModel::coarse_guess(const Target& target) const noexcept {
+    ImageTime seen{0.5 * length(), 0.0, false};
+    // Three times the orbit's span: a guess may miss it by a little, and Newton's steps on their way by a lot.
+    const TimeSpan span{-length(), 2.0 * length()};
+    image_time({coarse_x_, coarse_y_, coarse_z_}, target.point, seen.t_s, span, target.lambda_m, target.fd_hz,
+               &seen);
+    return seen.t_s;
+}
+
+int OrbitModel::solve_near(double guess_since_first_s, const Target& target, double* t, double* range_s) noexcept {
+    constexpr double kSpacings = kRunVectors - 1;
+    double guess = t0_ + guess_since_first_s;
+    for (std::int32_t before = -1;; before = current_) {
+        const OrbitRun& here = select(guess);
+        if (current_ == before) return QUO_OK;
+        const double length = kSpacings * dt_;
+        ImageTime seen{};
+        const int status = image_time(here.curve(), target.point, std::clamp(guess - tc_, 0.0, length),
+                                      {0.0, length}, target.lambda_m, target.fd_hz, &seen);
+        const bool solved = status == QUO_OK && seen.settled && seen.t_s >= 0.0 && seen.t_s <= length;
+        if (!solved) return before < 0 ? static_cast<int>(QUO_NOT_SEEN) : static_cast<int>(QUO_OK);
+        guess = *t = tc_ + seen.t_s;
+        *range_s = seen.tau_s;
+        // A guess at the edge of a run's middle leads out of it, where another run serves: once more there.
+        if (before >= 0 || (guess >= earliest_ && guess <= latest_)) return QUO_OK;
+    }
+}
+
+void OrbitModel::settle(const PointTimes& found, const Target& target, double* t, double* range_s) noexcept {
+    if (solve_near(found.since_first_s, target, t, range_s) == QUO_OK) return;
+    *t = t0_ + found.since_first_s;
+    *range_s = found.range_s;
+}
+
+int OrbitModel::solve_anywhere(double guess_since_first_s, const Target& target,
+                               PointTimes* found) const noexcept {
+    const double length = (kRunVectors - 1) * dt_;
+    const std::int32_t last = runs_count_ - 1;
+    double since_first = guess_since_first_s;
+    // Each turn moves on by up to a run's length: the turns suffice for any orbit and end any to and fro.
+    for (std::int32_t turn = 0; turn < runs_count_ + 2; ++turn) {
+        const std::int32_t k = centred_run(since_first / dt_);
+        ImageTime seen{};
+        if (image_time(run(k).curve(), target.point, std::clamp(since_first - k * dt_, 0.0, length),
+                       {-length, 2.0 * length}, target.lambda_m, target.fd_hz, &seen) ||
+            !seen.settled)
+            return QUO_NOT_SEEN;
+        const double u = seen.t_s;
+        const double early = k == 0 ? -kEndTolerance_s : 0.0;
+        const double late = k == last ? length + kEndTolerance_s : length;
+        if (u >= early && u <= late) {
+            *found = {k * dt_ + u, seen.tau_s};
+            return QUO_OK;
+        }
+        if ((u < early && k == 0) || (u > late && k == last)) return QUO_NOT_SEEN;
+        since_first = k * dt_ + u;
+    }
+    return QUO_NOT_SEEN;
+}
+
+/** The Doppler equation at one time: positive before the platform passes the place where it holds, negative after,
+ * or the other way round where the platform turns. */
+struct OrbitModel::Crossing {
+    double since_first_s, residual, slope, range_s;
+
+    [[nodiscard]] bool opposite(const Crossing& other) const noexcept {
+        return (residual < 0.0) != (other.residual < 0.0);
+    }
+    /** Whether the residual shrinks in size as time goes on. */
+    [[nodiscard]] bool nearing() const noexcept { return (residual < 0.0) == (slope > 0.0); }
+};
+
+OrbitModel::Crossing OrbitModel::crossing_at(double since_first_s, std::int32_t run_number,
+                                             const Target& target) const noexcept {
+    const OrbitState platform = orbit_state(run(run_number).curve(), since_first_s - run_number * dt_);
+    const DopplerResidual at = doppler_residual(platform, target.point, target.range_rate_m_s());
+    return {since_first_s, at.value, at.slope, 2.0 / kLightSpeed * std::sqrt(at.range2_m2)};
+}
+
+/** Newton's step where it stays between the two times, else halving. */
+PointTimes OrbitModel::crossing_between(Crossing before, Crossing after, std::int32_t run_number,
+                                        const Target& target) const noexcept {
+    constexpr int kMostSteps = 100;
+    Crossing here = before;
+    for (int step = 0; step < kMostSteps && after.since_first_s - before.since_first_s > kInverseStep; ++step) {
+        const double newton = here.since_first_s - here.residual / here.slope;
+        const bool inside = newton > before.since_first_s && newton < after.since_first_s;
+        const double next = inside ? newton : 0.5 * (before.since_first_s + after.since_first_s);
+        const double change = std::abs(next - here.since_first_s);
+        here = crossing_at(next, run_number, target);
+        (here.opposite(before) ? after : before) = here;
+        if (inside && change < kInverseStep) break;
+    }
+    return {here.since_first_s, here.range_s};
+}
+
+/** Where the residual comes nearest to 0 before it grows again; any place beyond 0 on the way there. */
+OrbitModel::Crossing OrbitModel::turn_between(Crossing before, Crossing after, std::int32_t run_number,
+                                              const Target& target) const noexcept {
+    Crossing here = before;
+    while (after.since_first_s - before.since_first_s > kInverseStep) {
+        const double middle = 0.5 * (before.since_first_s + after.since_first_s);
+        if (!(middle > before.since_first_s && middle < after.since_first_s)) break;
+        here = crossing_at(middle, run_number, target);
+        if (here.opposite(before)) break;
+        (here.nearing() ? before : after) = here;
+    }
+    return here;
+}
+
+/** The nearest of the times found so far. */
+struct OrbitModel::Nearest {
+    PointTimes* found;
+    int status = QUO_NOT_SEEN;
+
+    void take(const PointTimes& times) noexcept {
+        if (status == QUO_OK && times.range_s >= found->range_s) return;
+        *found = times;
+        status = QUO_OK;
+    }
+};
+
+void OrbitModel::search_piece(double from_s, double to_s, std::int32_t run_number, const Target& target,
+                              Nearest& nearest) const noexcept {
+    // A residual of so little, as a range rate, is 0: the two solutions meet where it turns.
+    constexpr double kTouch_m_s = 1e-9;
+    const Crossing before = crossing_at(from_s, run_number, target), after = crossing_at(to_s, run_number, target);
+    if (before.opposite(after)) return nearest.take(crossing_between(before, after, run_number, target));
+    if (!before.nearing() || after.nearing()) return;
+    const Crossing turn = turn_between(before, after, run_number, target);
+    if (turn.opposite(before)) {
+        nearest.take(crossing_between(before, turn, run_number, target));
+        nearest.take(crossing_between(turn, after, run_number, target));
+    } else if (std::abs(turn.residual) <= kTouch_m_s * 0.5 * kLightSpeed * turn.range_s) {
+        nearest.take({turn.since_first_s, turn.range_s});
+    }
+}
+
+int OrbitModel::search_all(const Target& target, PointTimes* found) const noexcept {
+    // Neighbouring runs differ a little, and each serves for times that others serve for as well. Where two
+    // solutions nearly meet only one of the runs may have them, so that each is searched over all it serves for.
+    const std::int32_t last = runs_count_ - 1;
+    Nearest nearest{found};
+    for (std::int32_t k = 0; k <= last; ++k) {
+        const double from = k == 0 ? -kEndTolerance_s : (k + kKeepFrom) * dt_;
+        const double to = k == last ? length() + kEndTolerance_s : (k + kKeepUntil) * dt_;
+        double at = from;
+        for (std::int32_t vector = k + 1; vector <= k + 3; ++vector) {
+            search_piece(at, vector * dt_, k, target, nearest);
+            at = vector * dt_;
+        }
+        search_piece(at, to, k, target, nearest);
+    }
+    return nearest.status;
+}
+
+double OrbitModel::nearest_start(const Vec3& point) const noexcept {
+    double nearest2 = std::numeric_limits<double>::infinity();
+    std::int32_t at = 0;
+    for (std::int32_t k = 0; k < runs_count_; ++k) {
+        const Vec3 d = point - run(k).start();
+        if (dot(d, d) >= nearest2) continue;
+        nearest2 = dot(d, d);
+        at = k;
+    }
+    return at * dt_;
+}
+
+}  // namespace quo
