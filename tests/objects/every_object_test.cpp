@@ -1,0 +1,303 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <concepts>
+#include <filesystem>
+#include <functional>
+#include <memory>
+#include <set>
+#include <string>
+#include <typeinfo>
+#include <vector>
+
+#include "objects/records.h"
+#include "support/diagnostics.h"
+#include "support/fields.h"
+#include "support/limits.h"
+
+// What holds for every header object and every configuration record. Its fields are those that
+// tests/data/objects/fields.csv lists, and a filled object is, byte for byte, the header that stands beside the
+// list; the parameter file of its name holds the same values.
+
+namespace {
+
+using testing::Contains, testing::ElementsAreArray, testing::IsEmpty, testing::Not;
+using Object = GeneralSAR_BaseXML;
+
+// --- one way to read, write and copy each of them ---------------------------------------------------------------
+
+constexpr const char *kPolynomial = "Polynomial-0", *kRegion = "SubArea", *kPoint = "NorthWest";
+
+int read_object(GeneralSAR_Base& object, const char* file) { return object.readhdr(file); }
+int read_object(ROI_Obj& object, const char* file) { return object.read_roi(file, kRegion); }
+int read_object(geopoint& object, const char* file) { return object.readhdr(file, kPoint); }
+int read_object(Coregist& object, const char* file) { return object.readpar(file); }
+template <std::derived_from<poly> Polynomial>
+int read_object(Polynomial& object, const char* file) {
+    return object.readpar(file, kPolynomial);
+}
+
+int write_object(GeneralSAR_Base& object, const char* file) { return object.writehdr(file); }
+int write_object(ROI_Obj& object, const char* file) { return object.write_roi(file, kRegion); }
+int write_object(geopoint& object, const char* file) { return object.writehdr(file, kPoint); }
+int write_object(Coregist& object, const char* file) { return object.writepar(file); }
+int write_object(poly& object, const char* file) { return object.writepar(file, kPolynomial); }
+// Its raster is described in the same file.
+int write_object(AntennaPattern_Obj& object, const char* file) {
+    const std::string name = file ? file : "";
+    object.PatternFile.setFilename(name.substr(0, name.rfind('.')).c_str());
+    return object.writehdr();
+}
+
+int status_of(const std::function<int()>& call, const std::string& what) {
+    try {
+        return call();
+    } catch (const quorelException& e) {
+        EXPECT_EQ(e.what(), what);
+        return 1;
+    }
+}
+int read_object(GeneralSAR_ConfigurationRecord& object, const char* file) {
+    return status_of([&] { return object.readpar(file, 1); }, "Cannot read specific configuration file");
+}
+int write_object(GeneralSAR_ConfigurationRecord& object, const char* file) {
+    return status_of([&] { return object.writepar(file, 1); }, "Cannot write specific configuration file");
+}
+
+template <typename Class>
+int clone_object(Class& from, Class& to) {
+    return from.clone(&to);
+}
+int clone_object(BufferFile& from, BufferFile& to) { return to.clone(&from); }
+
+constexpr int kNoOrbit = QUO_READ_FAILED;
+
+struct Subject {
+    const char* name;  // of the class
+    std::unique_ptr<Object> (*make)();
+    int (*read)(Object&, const char*), (*write)(Object&, const char*), (*clone)(Object&, Object&);
+    int incomplete = 1, unwritable = 1;  // statuses of reading less than is mandatory, and of writing in vain
+    std::vector<const char*> not_cloned = {};
+    std::vector<const char*> spoilt = {};  // by reading what is no header
+};
+void PrintTo(const Subject& row, std::ostream* stream) { *stream << row.name; }
+
+template <typename Class>
+Subject subject(const char* name, int incomplete = 1, int unwritable = 1) {
+    return {
+        name,
+        []() -> std::unique_ptr<Object> { return std::make_unique<Class>(); },
+        [](Object& object, const char* file) { return read_object(static_cast<Class&>(object), file); },
+        [](Object& object, const char* file) { return write_object(static_cast<Class&>(object), file); },
+        [](Object& from, Object& to) { return clone_object(static_cast<Class&>(from), static_cast<Class&>(to)); },
+        incomplete,
+        unwritable};
+}
+std::vector<Subject> subjects() {
+    std::vector<Subject> all{
+        subject<SamplingConstants_Obj>("SamplingConstants_Obj"),
+        subject<SARPulse_Obj>("SARPulse_Obj"),
+        subject<SensorAttitude_Obj>("SensorAttitude_Obj"),
+        subject<SpectralWindows_Obj>("SpectralWindows_Obj"),
+        subject<QuickLook_Obj>("QuickLook_Obj", 0),
+        subject<DataSetInfo_Obj>("DataSetInfo_Obj"),
+        subject<SwathInfo>("SwathInfo"),
+        subject<AntennaPattern_Obj>("AntennaPattern_Obj"),
+        subject<geopoint>("geopoint", 0),
+        subject<geoCoords_Obj>("geoCoords_Obj"),
+        subject<GSRoi_Obj>("GSRoi_Obj", 1, 0),
+        subject<GSDataFile_Obj>("GSDataFile_Obj", 0, 0),
+        subject<BufferFile>("BufferFile"),
+        subject<SAROrbitStateVectors_Obj>("SAROrbitStateVectors_Obj", kNoOrbit),
+        subject<GeneralSAROrbit>("GeneralSAROrbit", kNoOrbit),
+        subject<ROI_Obj>("ROI_Obj", 1, 0),
+        subject<ROI_Coords>("ROI_Coords"),
+        subject<Coregist>("Coregist", 1, 0),
+        subject<poly>("poly"),
+        subject<polyDC>("polyDC"),
+        subject<polyFR>("polyFR"),
+        subject<polySL2GR>("polySL2GR"),
+        subject<polyGR2SL>("polyGR2SL"),
+        subject<polySL2THETA>("polySL2THETA"),
+        subject<polySL2PHI>("polySL2PHI"),
+        subject<extended_polyDC>("extended_polyDC"),
+        subject<extended_polyFR>("extended_polyFR"),
+        subject<polySAR>("polySAR"),
+        subject<AzimuthConf>("AzimuthConf"),
+        subject<DCestConf>("DCestConf"),
+        subject<ExtractorConf>("ExtractorConf"),
+        subject<generalProcessingConf>("generalProcessingConf"),
+        subject<FinefitestConf>("FinefitestConf"),
+        subject<EnvisatCalibrationFactors>("EnvisatCalibrationFactors"),
+        subject<DemExtractorConf>("DemExtractorConf"),
+        subject<GeocodingConf>("GeocodingConf"),
+        subject<ATPrecise_FitestConf>("ATPrecise_FitestConf"),
+        subject<CoregistrationConf>("CoregistrationConf"),
+        subject<CoherenceConf>("CoherenceConf"),
+    };
+    for (Subject& row : all) {
+        if (row.name == std::string_view{"QuickLook_Obj"}) row.not_cloned = {"QL_AzimuthML", "QL_RangeML"};
+        if (row.name == std::string_view{"GSDataFile_Obj"}) row.spoilt = {"File.CellType"};
+    }
+    return all;
+}
+
+// --- the suite --------------------------------------------------------------------------------------------------
+
+class EveryObject : public testing::TestWithParam<Subject> {
+protected:
+    std::unique_ptr<Object> filled(int seed = 1) {
+        auto object = subject_.make();
+        test::fill(*object, seed);
+        return object;
+    }
+    /** The status of reading `content`. Every call has a file of its own: parameter files stay in memory under
+     * their names. */
+    int read(Object& object, const std::string& content) {
+        const std::string file = report_.file("header" + std::to_string(++files_) + ".hdr");
+        test::write_text(file, content);
+        return subject_.read(object, file.c_str());
+    }
+    [[nodiscard]] int expected(bool complete) const { return complete ? 0 : subject_.incomplete; }
+    [[nodiscard]] std::string golden(const char* ending) const {
+        const std::string file = std::string{QUO_TEST_DATA} + "/objects/" + subject_.name + ending;
+        EXPECT_TRUE(std::filesystem::exists(file)) << file;
+        return test::read_text(file);
+    }
+    /** A new object; an orbit as a failed read leaves it, which may have had a count before. */
+    [[nodiscard]] std::unique_ptr<Object> fresh() const {
+        auto object = subject_.make();
+        if (subject_.incomplete == kNoOrbit) object->destroyBuffers();
+        return object;
+    }
+    /** What was read with one value missing against the same read whole: the others arrive, unless the object is
+     * nothing without all of its parts. */
+    void expect_all_but(const std::string& name, Object& whole, Object& partial, bool mandatory) {
+        if (name == "PatternSamples") return;  // follows the raster
+        EXPECT_THAT(test::differing_fields(*fresh(), partial), Not(Contains(name)));
+        if (mandatory && (subject_.incomplete == kNoOrbit || dynamic_cast<polySAR*>(&whole))) return;
+        EXPECT_THAT(test::differing_fields(whole, partial), ElementsAreArray({name}));
+    }
+
+    const Subject& subject_ = GetParam();
+    const std::vector<test::ListedField> fields_ = test::listed_fields(subject_.name);
+    const bool has_parameter_file_ =
+        dynamic_cast<GeneralSAR_ConfigurationRecord*>(subject_.make().get()) == nullptr &&
+        (fields_.empty() || !fields_[0].key.empty());
+    const test::Report report_;
+    const std::string file_ = report_.file("written.hdr");
+    int files_ = 0;
+};
+INSTANTIATE_TEST_SUITE_P(Of, EveryObject, testing::ValuesIn(subjects()),
+                         [](const auto& row) { return std::string{row.param.name}; });
+
+TEST_P(EveryObject, RegistersTheListedFields) {
+    const auto object = subject_.make();
+    std::vector<std::string> listed;
+    for (const auto& field : fields_) listed.push_back(field.description);
+    EXPECT_EQ(test::descriptions(*object), listed);
+    if (auto* const record = dynamic_cast<GeneralSAR_ConfigurationRecord*>(object.get())) {
+        EXPECT_STREQ(record->section(), subject_.name);
+        const auto made = GeneralSAR_ConfigurationRecord::make(subject_.name);
+        ASSERT_TRUE(made);
+        EXPECT_EQ(typeid(*made), typeid(*record));
+        EXPECT_STREQ(record->meaning(-1), "");
+        EXPECT_STREQ(record->unit(1000), "");
+    }
+}
+
+TEST_P(EveryObject, IsWrittenAsTheGoldenHeader) {
+    for (const int seed : {2, 1}) EXPECT_EQ(subject_.write(*filled(seed), file_.c_str()), 0);
+    EXPECT_EQ(test::read_text(file_), golden(".xml"));
+}
+
+TEST_P(EveryObject, ComesBackFromTheGoldenHeader) {
+    const auto object = subject_.make();
+    EXPECT_EQ(read(*object, golden(".xml")), 0);
+    EXPECT_THAT(test::differences(*filled(), *object), IsEmpty());
+}
+
+TEST_P(EveryObject, FailsOnlyWithoutAMandatoryElement) {
+    const auto whole = filled();
+    for (int i = 0; i < whole->elementCount(); ++i) {
+        const parElement& element = *whole->element(i);
+        SCOPED_TRACE(element.name);
+        const auto object = subject_.make();
+        EXPECT_EQ(read(*object, test::without_element(golden(".xml"), element.name)),
+                  expected(!element.mandatory));
+        if (element.mandatory) {
+            EXPECT_THAT(test::differing_fields(*fresh(), *object), Not(Contains(element.name)));
+        } else {
+            expect_all_but(element.name, *whole, *object, false);
+        }
+    }
+}
+
+TEST_P(EveryObject, ComesBackFromTheGoldenParameterFile) {
+    if (!has_parameter_file_) return;
+    std::vector<std::string> header_only;
+    const auto object = subject_.make();
+    for (std::size_t i = 0; i < fields_.size(); ++i)
+        if (fields_[i].key == "-") header_only.emplace_back(object->element(static_cast<int>(i))->name);
+    EXPECT_EQ(read(*object, golden(".par")), 0);
+    EXPECT_EQ(test::differences(*filled(), *object), header_only);
+}
+
+// Every key is read, whichever failed: the others arrive.
+TEST_P(EveryObject, FailsOnlyWithoutAMandatoryKey) {
+    if (!has_parameter_file_) return;
+    const std::string text = golden(".par");
+    const auto whole = subject_.make();
+    read(*whole, text);
+    for (std::size_t i = 0; i < fields_.size(); ++i) {
+        const auto& [key, mandatory, description] = fields_[i];
+        if (key == "-") continue;
+        SCOPED_TRACE(key);
+        const auto start = text.find("\n" + key + " = "), end = text.find('\n', start + 1);
+        ASSERT_NE(start, text.npos);
+        const auto object = subject_.make(), cut = subject_.make();
+        EXPECT_EQ(read(*object, std::string{text}.erase(start, end - start)), expected(!mandatory));
+        expect_all_but(whole->element(static_cast<int>(i))->name, *whole, *object, mandatory);
+        if (text[end - 1] != '}') continue;
+        const auto last = text.rfind(' ', end);
+        EXPECT_EQ(read(*cut, std::string{text}.erase(last, end - 1 - last)), expected(!mandatory))
+            << "one value less";
+    }
+}
+
+TEST_P(EveryObject, StaysAsItWasWithoutAWholeFile) {
+    const auto object = subject_.make();
+    const std::string missing = report_.file("missing.hdr"), text = golden(".xml");
+    for (const char* file : {missing.c_str(), "", static_cast<const char*>(nullptr)})
+        EXPECT_EQ(subject_.read(*object, file), expected(false));
+    EXPECT_FALSE(std::filesystem::exists(missing));
+    for (std::size_t length = 0; length + 2 < text.size(); length += 1 + text.size() / 40)
+        EXPECT_EQ(read(*object, text.substr(0, length)), expected(false)) << length;
+    EXPECT_THAT(test::differences(*fresh(), *object), ElementsAreArray(subject_.spoilt));
+}
+
+TEST_P(EveryObject, KeepsTheOldFileWhereItCannotBeWritten) {
+    const test::CapturedStderr silent;
+    const std::string nowhere = report_.file("no_such_folder/header.hdr");
+    const auto object = filled();
+    for (const char* file : {nowhere.c_str(), "", static_cast<const char*>(nullptr)})
+        EXPECT_EQ(subject_.write(*object, file), subject_.unwritable);
+    subject_.write(*filled(2), file_.c_str());
+    const std::string old = test::read_text(file_);
+    for (const std::size_t room : {std::size_t{0}, old.size() / 2}) {
+        {
+            const test::FullDisk full{room};
+            EXPECT_EQ(subject_.write(*object, file_.c_str()), subject_.unwritable);
+        }
+        EXPECT_EQ(test::read_text(file_), old) << room;
+    }
+}
+
+TEST_P(EveryObject, ClonesIntoItsArgument) {
+    const auto source = filled(1), same = filled(1), target = filled(2);
+    EXPECT_EQ(subject_.clone(*source, *target), 0);
+    EXPECT_THAT(test::differences(*source, *same), IsEmpty());
+    EXPECT_THAT(test::differences(*source, *target), ElementsAreArray(subject_.not_cloned));
+}
+
+}  // namespace
