@@ -124,9 +124,14 @@ inline void fill(GeneralSAR_BaseXML& object, int seed = 1) {
             raster->ByteOrder = seed % 2;
             raster->CellType = seed == 1 ? SHORT_COMPLEX : INT16;
         }
-        if (auto* const swath = dynamic_cast<SwathInfo*>(part)) swath->Swst_changes = 2 + seed;
-        if (auto* const pattern = dynamic_cast<AntennaPattern_Obj*>(part)) pattern->PatternSamples = 16 + seed;
-        if (!set) EXPECT_EQ(part->createBuffers(), 0);
+        if (auto* const swath = dynamic_cast<SwathInfo*>(part)) {
+            swath->Swst_changes = 2 + seed;
+            swath->createBuffers();
+        }
+        if (auto* const pattern = dynamic_cast<AntennaPattern_Obj*>(part)) {
+            pattern->PatternSamples = 16 + seed;
+            pattern->createBuffers();
+        }
         if (auto* const vectors = dynamic_cast<SAROrbitStateVectors_Obj*>(part)) set_orbit(*vectors, 4 + seed);
         if (auto* const orbit = dynamic_cast<GeneralSAROrbit*>(part)) set_orbit(*orbit, 4 + seed);
     }

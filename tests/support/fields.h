@@ -12,7 +12,6 @@
 #include <fstream>
 #include <iterator>
 #include <span>
-#include <sstream>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -164,28 +163,38 @@ inline void expect_fields(const GeneralSAR_BaseXML& object, std::span<const Fiel
     }
 }
 
-/** One line of tests/data/objects/fields.csv: "class,key,needed,description". */
+/** The lines of a table of the test data, each cut at the separator into at most `columns` texts. */
+inline std::vector<std::vector<std::string>> read_table(const std::string& name, char separator = ',',
+                                                        std::size_t columns = 100) {
+    std::ifstream file{QUO_TEST_DATA + ("/" + name)};
+    EXPECT_TRUE(file) << name;
+    std::vector<std::vector<std::string>> rows;
+    for (std::string line; std::getline(file, line);) {
+        if (line.starts_with('#')) continue;
+        std::vector<std::string>& row = rows.emplace_back();
+        for (auto end = line.find(separator); end != line.npos && row.size() + 1 < columns;
+             end = line.find(separator)) {
+            row.push_back(line.substr(0, end));
+            line.erase(0, end + 1);
+        }
+        row.push_back(line);
+    }
+    errno = 0;
+    return rows;
+}
+
+/** What is promised of a field. */
 struct ListedField {
     std::string key;          ///< in parameter files; "-" where it is not read from them, empty where none is read
     bool mandatory;           ///< in parameter files
-    std::string description;  ///< as descriptions() gives it
+    std::string description;  ///< see described()
 };
 
 /** The listed fields of a class, in order. */
 inline std::vector<ListedField> listed_fields(const std::string& name) {
     std::vector<ListedField> fields;
-    std::ifstream file{QUO_TEST_DATA "/objects/fields.csv"};
-    EXPECT_TRUE(file);
-    for (std::string line; std::getline(file, line);) {
-        std::istringstream cells{line};
-        std::string owner, key, needed, rest;
-        std::getline(cells, owner, ',');
-        std::getline(cells, key, ',');
-        std::getline(cells, needed, ',');
-        std::getline(cells, rest);
-        if (owner == name) fields.push_back({key, needed == "mandatory", rest});
-    }
-    errno = 0;
+    for (const auto& row : read_table("objects/fields.csv", ',', 4))
+        if (row[0] == name) fields.push_back({row[1], row[2] == "mandatory", row[3]});
     return fields;
 }
 

@@ -8,7 +8,7 @@
 #include <string>
 
 #include "support/diagnostics.h"
-#include "support/header_object_suite.h"
+#include "support/fields.h"
 
 namespace {
 
@@ -143,36 +143,6 @@ TEST(Coregist, RefusesWhatHasNoInverse) {
     EXPECT_EQ(fit.ConvertPolys(&empty, nullptr), 1);
     EXPECT_EQ(fit.RgFit[0], -1.0);
 }
-
-/** Its two operations under the names that header objects have. */
-class Header : public Coregist {
-public:
-    int readhdr(const char* file) override { return readpar(file); }
-    int writehdr(const char* file) override { return writepar(file); }
-};
-struct CoregistCase : test::HeaderCase {
-    using Object = Header;
-    static constexpr const char* kSection = "REGIST";
-    static constexpr bool kWriteAlwaysSays0 = true;
-    static constexpr auto kOptional = test::Presence::kOptional;
-    static constexpr test::FieldRow kRows[] = {
-        test::real("Az_Fit_Coeff", 0.0, 4),
-        test::real("Rg_Fit_Coeff", 0.0, 4),
-        test::real("RgFit", 0.0, 4).keyed("Rg_Fit_Coeff_Time"),
-        test::real("AzFit", 0.0, 4).keyed("Az_Fit_Coeff_Time"),
-        test::real("trg0_s", 0.0).keyed("Rg_Time_Origin"),
-        test::real("taz0_s", 0.0).keyed("Az_Time_Origin"),
-        test::whole("Az_Samples_Origin", 0.0),
-        test::whole("Rg_Samples_Origin", 0.0),
-        test::real("Rg_Fit_Coeffs_Relative_Errors", 0.0, 4).is(kOptional),
-        test::real("Az_Fit_Coeffs_Relative_Errors", 0.0, 4).is(kOptional),
-    };
-};
-}  // namespace
-namespace test {
-INSTANTIATE_TYPED_TEST_SUITE_P(Coregist, HeaderObject, CoregistCase, CaseName);
-}
-namespace {
 
 TEST(Coregist, ReadingPreparesTheInverseOrSaysWhatFailed) {
     const test::Report report;

@@ -1,17 +1,14 @@
-#include "support/geometry.h"
-
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <array>
 #include <cmath>
-#include <cstdio>
 #include <vector>
 
 #include "quo_base/Coregist.h"
 #include "quo_base/MatrixAlgebraANSI.h"
 #include "quo_base/generalSARorbit.h"
 #include "quo_base/roi.h"
+#include "support/geometry.h"
 #include "support/scenes.h"
 
 // Coregistration of a real scene with a pass repeated beside it, from geometry alone.
@@ -136,8 +133,6 @@ TEST_P(Coregistration, FollowsTheGeometryInBothForms) {
             azimuth_worst =
                 std::max(azimuth_worst, std::abs(azimuth_s(m) - m.slave_azimuth_s) / slave_.SlowTimeDelta);
         }
-        std::printf("%-26s %-8s range %9.3g samples  azimuth %9.3g lines\n", GetParam().name, form, range_worst,
-                    azimuth_worst);
         EXPECT_LT(range_worst, GetParam().range_bound) << form;
         EXPECT_LT(azimuth_worst, GetParam().azimuth_bound) << form;
     };
@@ -169,22 +164,6 @@ TEST_P(Coregistration, FollowsTheGeometryInBothForms) {
         EXPECT_NEAR(range_s(back), m.slave_range_s, 1e-15);
         EXPECT_NEAR(azimuth_s(back), m.slave_azimuth_s, 5e-7);
     }
-}
-
-// The mapping says what a baseline does: the range grows by its part along the line of sight, the lines shift by
-// the time between the passes.
-TEST_P(Coregistration, ShowsTheBaselineAlongTheLineOfSight) {
-    const Match& m = matches_[matches_.size() / 2];
-    Vec3 ground{}, first{}, second{};
-    ASSERT_EQ(master_orbit_.sat2earth(m.azimuth_s, m.range_s, ground.v), 0);
-    ASSERT_EQ(master_orbit_.SVGetPos(m.azimuth_s, first.v), 0);
-    ASSERT_EQ(slave_orbit_.SVGetPos(m.slave_azimuth_s, second.v), 0);
-    make_mapping();
-    const double along_m = dot(second - first, unit(ground - first));
-    const double range_m =
-        0.5 * test::kLightSpeed * (fit_.evaluateSLtimeRange(m.range_s, m.azimuth_s) - m.range_s);
-    EXPECT_NEAR(range_m, -along_m, 0.2 + 1e-6);  // the baseline squared over twice the range
-    EXPECT_NEAR(fit_.evaluateSLtimeAzimuth(m.range_s, m.azimuth_s) - m.azimuth_s, GetParam().late_s, 0.1);
 }
 
 }  // namespace
