@@ -123,18 +123,15 @@ TEST_F(BurstTimes, AreThoseOfTheFirstLineOfEachBurst) {
 TEST_F(BurstTimes, RefuseHostileCounts) {
     make();
     constexpr std::int32_t kMost = 2147483647;
-    const std::int32_t rows[][3] = {{kMost, 4, 4}, {3, kMost, 4}, {kMost, kMost, 1},
-                                    {4, 4, 4},     {3, 0, 1},     {-999, 4, 1}};
+    const std::int32_t rows[][3] = {{kMost, 4, 4}, {3, kMost, 4}, {kMost, kMost, 1}, {4, 4, 4},
+                                    {3, 0, 1},     {3, -4, 1},    {-999, 4, 1}};
     for (const auto& [bursts, lines, status] : rows) {
         SCOPED_TRACE(testing::Message() << bursts << " bursts of " << lines << " lines");
         describe(bursts, lines);
         expect_status(status);
     }
-    SwathInfo none;
     describe(0, 4);
-    EXPECT_EQ(none.readBurstTimes(name_.c_str()), 0);
-    EXPECT_THAT(none.BurstStartTimes, IsEmpty());
-
+    EXPECT_EQ(SwathInfo{}.readBurstTimes(name_.c_str()), 0);
     std::filesystem::remove(name_);
     expect_status(9);
     std::filesystem::remove(name_ + ".hdr");
@@ -172,10 +169,6 @@ protected:
 
 TEST_F(Pattern, LoadsItsSamplesOnce) {
     write_pattern();
-    std::string line;
-    for (const float value : {1.5F, 0.0F, -0.25F}) test::append_bytes(line, value, false);
-    EXPECT_EQ(test::read_text(name_), line);
-
     AntennaPattern_Obj target;
     ASSERT_EQ(target.readhdr(header_.c_str()), 0);
     EXPECT_THAT(target.Pattern, Each(0.0F));
@@ -183,10 +176,13 @@ TEST_F(Pattern, LoadsItsSamplesOnce) {
     EXPECT_THAT(target.Pattern, ElementsAre(1.5F, 0.0F, -0.25F));
     std::filesystem::remove(name_);
     EXPECT_THAT(samples(target), ElementsAre(1.5F, 0.0F, -0.25F)) << "read again although loaded";
-    AntennaPattern_Obj copy;
-    EXPECT_EQ(target.clone(&copy), 0);
-    EXPECT_EQ(copy.Pattern, target.Pattern);
-    EXPECT_EQ(copy.PatternFile.FileName, name_);
+    write_pattern();
+    test::fail_every_allocation([&] {
+        AntennaPattern_Obj pattern;
+        EXPECT_EQ(pattern.readhdr(header_.c_str()), 0);
+        float values[3];
+        return pattern.getPatternArray(values);
+    });
 }
 
 TEST_F(Pattern, HasAsManySamplesAsItsRaster) {
@@ -207,37 +203,23 @@ TEST_F(Pattern, HasAsManySamplesAsItsRaster) {
 }
 
 TEST_F(Pattern, RefusesWhatIsNoPattern) {
-    AntennaPattern_Obj empty, complex, hostile, nameless;
+    AntennaPattern_Obj empty, pattern;
     EXPECT_THAT(samples(empty, 1), Each(803.5F));
-    EXPECT_EQ(empty.getPatternArray(nullptr), 1);
-    EXPECT_EQ(empty.WritePatternArray(), 1);
-    EXPECT_EQ(nameless.writehdr(), 1);
-    EXPECT_EQ(nameless.readhdr(".hdr"), 1);
+    EXPECT_EQ(
+        empty.getPatternArray(nullptr) + empty.WritePatternArray() + empty.writehdr() + empty.readhdr(".hdr"), 4);
 
-    make_pattern(complex);
-    complex.Pattern.clear();
-    complex.PatternFile.CellType = FLOAT_COMPLEX;
-    EXPECT_THAT(samples(complex, 1), Each(803.5F));
-    complex.PatternFile.CellType = FLOAT32;
-    complex.PatternFile.NrOfPixelsPerLine = 3;
-    complex.PatternFile.NrOfLinesPerImage = 1;
-    EXPECT_THAT(samples(complex, 9), Each(803.5F));
+    make_pattern(pattern);
+    pattern.Pattern.clear();
+    pattern.PatternFile.CellType = FLOAT_COMPLEX;
+    EXPECT_THAT(samples(pattern, 1), Each(803.5F));
+    pattern.PatternFile.CellType = FLOAT32;
+    pattern.PatternFile.NrOfPixelsPerLine = 3;
+    EXPECT_THAT(samples(pattern, 9), Each(803.5F));
     test::write_text(name_, "eleven byte");
-    EXPECT_THAT(samples(complex, 4), Each(803.5F));
-
-    hostile.PatternSamples = AntennaPattern_Obj::kMaxPatternSamples + 1;
-    EXPECT_EQ(hostile.createBuffers(), 1);
-    EXPECT_THAT(hostile.Pattern, IsEmpty());
-}
-
-TEST_F(Pattern, FailsWithoutMemory) {
-    write_pattern();
-    test::fail_every_allocation([&] {
-        AntennaPattern_Obj pattern;
-        EXPECT_EQ(pattern.readhdr(header_.c_str()), 0);
-        float values[3];
-        return pattern.getPatternArray(values);
-    });
+    EXPECT_THAT(samples(pattern, 4), Each(803.5F));
+    pattern.PatternSamples = AntennaPattern_Obj::kMaxPatternSamples + 1;
+    EXPECT_EQ(pattern.createBuffers(), 1);
+    EXPECT_THAT(pattern.Pattern, IsEmpty());
 }
 
 }  // namespace
