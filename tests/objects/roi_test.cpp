@@ -6,8 +6,10 @@
 #include <string>
 #include <tuple>
 #include <utility>
+#include <vector>
 
 #include "support/diagnostics.h"
+#include "support/fields.h"
 
 namespace {
 
@@ -100,37 +102,24 @@ TEST(Roi, HasCornersDownTheFastAxisAndRightTheSlowAxis) {
     }
 }
 
-struct Meeting {
-    const char* name;
-    Grid a, b, shared;
-    int step_a = 1, step_b = 1;
-};
-constexpr Meeting kMeetings[] = {
-    {"BInsideA", {0, 170, 0, 130}, {17, 23, 29, 31}, {17, 23, 29, 31}},
-    {"Corner", {0, 100, 0, 90}, {61, 100, 73, 100}, {61, 39, 73, 17}},
-    {"HalfASampleIsDropped", {0, 100, 0, 90}, {60.5, 100, 72.25, 100}, {60.5, 39, 72.25, 17}},
-    {"CoarserIntervals", {0, 96, 0, 60}, {8, 88, 16, 44}, {8, 88, 16, 44}, 1, 4},
-    {"FinerIntervals", {8, 88, 16, 44}, {0, 96, 0, 60}, {8, 88, 16, 44}, 4, 1},
-    // Nothing is shared: the lengths still tell by how much.
-    {"BesideInAzimuth", {0, 100, 0, 90}, {0, 100, 95, 10}, {0, 100, 95, -5}},
-    {"Touching", {0, 100, 0, 90}, {100, 10, 0, 90}, {100, 0, 0, 90}},
-    {"FarAway", {0, 100, 0, 90}, {200, 5, 300, 5}, {200, -100, 300, -210}},
-};
-
 TEST(RoiIntersection, IsWhatBothShareInTheIntervalsOfTheFirst) {
-    for (const Meeting& row : kMeetings) {
+    for (const std::vector<std::string>& row : test::read_table("objects/regions.csv")) {
+        SCOPED_TRACE(row[0]);
+        std::vector<double> n;
+        for (std::size_t i = 1; i < row.size(); ++i) n.push_back(std::stod(row[i]));
+        const Grid of_a{n[0], n[1], n[2], n[3]}, of_b{n[4], n[5], n[6], n[7]}, shared{n[8], n[9], n[10], n[11]};
+        const int step_a = static_cast<int>(n[12]), step_b = static_cast<int>(n[13]);
         for (const bool swapped : {false, true}) {
-            if (swapped && row.step_a != row.step_b) continue;
-            SCOPED_TRACE(row.name);
+            if (swapped && step_a != step_b) continue;
             ROI_Obj a, b, out;
-            place(a, swapped ? row.b : row.a, row.step_a);
-            place(b, swapped ? row.a : row.b, row.step_b);
+            place(a, swapped ? of_b : of_a, step_a);
+            place(b, swapped ? of_a : of_b, step_b);
             ASSERT_EQ(ROI_Obj::IntersectROI(&a, &b, &out), 0);
-            expect(out, row.shared, row.step_a);
+            expect(out, shared, step_a);
             // The result may take the place of either region.
             ROI_Obj& in_place = swapped ? a : b;
             ASSERT_EQ(ROI_Obj::IntersectROI(&a, &b, &in_place), 0);
-            expect(in_place, row.shared, row.step_a);
+            expect(in_place, shared, step_a);
         }
     }
 }
