@@ -189,20 +189,6 @@ TEST_F(PolySAR, EvaluatesAboutTheRightReference) {
         EXPECT_EQ(set_.EvaluateDC(0.0, azimuth) + set_.EvaluateDCinterp(0.0, azimuth), 14.0);
 }
 
-TEST(PolySARSet, LeavesNothingOfALargerOneBehind) {
-    const test::TemporaryFolder folder;
-    const std::string file = folder.file("product.xml");
-    polySAR written, read;
-    for (const int rates : {3, 0}) {
-        ASSERT_EQ(written.CreatePolys(2, rates), 0);
-        ASSERT_EQ(written.writehdr(file.c_str()), 0);
-        EXPECT_EQ(test::read_text(file).find("<DopplerRate-") == std::string::npos, rates == 0);
-        ASSERT_EQ(read.readhdr(file.c_str()), 0);
-        EXPECT_THAT(test::differing_fields(read, written), testing::IsEmpty());
-    }
-    EXPECT_EQ(read.FR, nullptr);
-}
-
 // The counts are public: a raised one was written, copied and evaluated from beyond the list.
 TEST(PolySARSet, HoldsWhatItsListsHoldWhateverTheCountsSay) {
     const test::TemporaryFolder folder;
