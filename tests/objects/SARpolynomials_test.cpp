@@ -46,14 +46,14 @@ TEST(Poly, PlacesEveryTerm) {
 
 // Reads a polynomial full of nines by its older keys.
 template <typename P, typename... More>
-void expect_old(const std::string& file, int status, const std::vector<double>& expected, double reference,
+void expect_old(const std::string& file, int status, const std::vector<double>& expected, bool has_reference,
                 More... more) {
     P p;
     std::ranges::fill(p.pol, 9.0);
     EXPECT_EQ(p.readparold(file.c_str(), "D", more...), status);
     EXPECT_THAT(p.pol, testing::ElementsAreArray(expected));
-    EXPECT_EQ(p.trg0, reference);
-    EXPECT_EQ(p.taz0, reference);
+    EXPECT_EQ(p.trg0, has_reference ? 0.25 : -999.0);
+    EXPECT_EQ(p.taz0, has_reference ? 9.5 : -999.0);
 }
 
 TEST(PolyOld, MapsItsCoefficients) {
@@ -73,16 +73,16 @@ TEST(PolyOld, MapsItsCoefficients) {
         const std::string file = folder.file("centroid" + std::to_string(++files));
         test::write_text(file,
                          std::string{"["} + row.section + "]\nDopCenPol_nCoeff = " + row.n +
-                             "\nDopCenRgRefTimes = 0.25\nDopCenAzRefSec85Times = 0.25\nDopCenRangeCoeffs = {" +
+                             "\nDopCenRgRefTimes = 0.25\nDopCenAzRefSec85Times = 9.5\nDopCenRangeCoeffs = {" +
                              row.coefficients + "}\n");
-        expect_old<polyDC>(file, row.status, row.pol, *row.section == 'D' ? 0.25 : -999.0);
+        expect_old<polyDC>(file, row.status, row.pol, *row.section == 'D');
     }
     const std::string file = folder.file("rate");
     test::write_text(file, "[D]\nAzimuthCoeff = {1 2 3 4 5}\nDopRatRangeCoeff = {11 12 13 14 15 16 17}\n");
-    expect_old<polyFR>(file, 0, {1, 2, 0, 0, 3, 4, 5}, -999.0, 5);
-    expect_old<polyFR>(file, 0, {1, 2, 9, 3, 9, 9, 9}, -999.0, 3);  // the cross term
-    expect_old<polyFR>(file, 0, {11, 12, 13, 14, 15, 16, 17}, -999.0, 7);
-    expect_old<polyFR>(file, 1, nines, -999.0, 4);
+    expect_old<polyFR>(file, 0, {1, 2, 0, 0, 3, 4, 5}, false, 5);
+    expect_old<polyFR>(file, 0, {1, 2, 9, 3, 9, 9, 9}, false, 3);  // the cross term
+    expect_old<polyFR>(file, 0, {11, 12, 13, 14, 15, 16, 17}, false, 7);
+    expect_old<polyFR>(file, 1, nines, false, 4);
 }
 
 /** All that a set tells of one of its quantities. */

@@ -42,7 +42,7 @@ int write_object(ROI_Obj& object, const char* file) { return object.write_roi(fi
 int write_object(geopoint& object, const char* file) { return object.writehdr(file, kPoint); }
 int write_object(Coregist& object, const char* file) { return object.writepar(file); }
 int write_object(poly& object, const char* file) { return object.writepar(file, kPolynomial); }
-// Its raster is described in the same file.
+// The same file holds the description of its raster.
 int write_object(AntennaPattern_Obj& object, const char* file) {
     const std::string name = file ? file : "";
     object.PatternFile.setFilename(name.substr(0, name.rfind('.')).c_str());
