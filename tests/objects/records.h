@@ -52,6 +52,7 @@ inline std::vector<Part> parts_of(GeneralSAR_BaseXML& object) {
 /** Every element of a new object; of a configuration record with unit and meaning. */
 inline std::vector<std::string> descriptions(const GeneralSAR_BaseXML& object) {
     std::vector<std::string> all;
+    all.reserve(static_cast<std::size_t>(object.elementCount()));
     const auto* const record = dynamic_cast<const GeneralSAR_ConfigurationRecord*>(&object);
     for (int i = 0; i < object.elementCount(); ++i)
         all.push_back(described(*object.element(i)) +
@@ -101,11 +102,12 @@ template <typename Orbit>
 void set_orbit(Orbit& orbit, int count) {
     orbit.nSV_n = count;
     EXPECT_EQ(orbit.createBuffers(), 0);
+    const double scale[] = {7.1e6, 6.3e6, 3.2e6};
     for (int i = 0; i < 3 * count; ++i) {
-        const double angle = 0.0103 * (i / 3), turned = angle + std::acos(0.0);
-        const double scale[] = {7.1e6, 6.3e6, 3.2e6};
-        orbit.pSV_m[i] = std::round(scale[i % 3] * std::cos(angle + i % 3));
-        orbit.vSV_mOs[i] = std::round(scale[i % 3] * std::cos(turned + i % 3)) / 1024.0;
+        const int vector = i / 3, axis = i % 3;
+        const double angle = 0.0103 * vector, turned = angle + std::acos(0.0);
+        orbit.pSV_m[i] = std::round(scale[axis] * std::cos(angle + axis));
+        orbit.vSV_mOs[i] = std::round(scale[axis] * std::cos(turned + axis)) / 1024.0;
     }
 }
 
