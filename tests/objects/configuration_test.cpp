@@ -160,7 +160,9 @@ TEST_F(DamagedConfiguration, IsReviewedAndReadWithoutLoss) {
         ASSERT_EQ(review.findings.size() + 3, row.size());
         for (std::size_t i = 3; i < row.size(); ++i) {
             const auto& [section, name, reason] = review.findings[i - 3];
-            EXPECT_THAT(section + "/" + name + " " + reason, testing::StartsWith(row[i]));
+            std::string line = section;
+            line.append("/").append(name).append(" ").append(reason);
+            EXPECT_THAT(line, testing::StartsWith(row[i]));
         }
         EXPECT_THAT(review.records, testing::UnorderedElementsAre("DCestConf", "DemExtractorConf"));
 
