@@ -8,7 +8,7 @@
 #include <memory>
 #include <ostream>
 
-#include "container/products.h"
+#include "objects/products.h"
 #include "quo_base/Coregist.h"
 #include "quo_base/MatrixAlgebraANSI.h"
 #include "quo_base/ckerr.h"
@@ -21,6 +21,7 @@
 #include "quo_base/quorelxml_v2.h"
 #include "support/diagnostics.h"
 #include "support/raster.h"
+#include "support/scenes.h"
 
 namespace {
 

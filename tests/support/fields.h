@@ -3,13 +3,18 @@
 
 #include <gtest/gtest.h>
 
+#include <cerrno>
+#include <charconv>
 #include <cstddef>
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
+#include <fstream>
+#include <iterator>
 #include <span>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include "quo_base/quorelxml_v2.h"
@@ -57,11 +62,11 @@ constexpr FieldRow text(const char* name, const char* value = "NOT_AVAILABLE") {
     return {name, parElement::typeString, 1, 0.0, value};
 }
 
-/** Every digit of a number. */
-inline std::string digits(double value) {
+/** The shortest text that tells a number from any other of its type. */
+template <typename Number>
+std::string digits(Number value) {
     char buffer[40];
-    std::snprintf(buffer, sizeof buffer, "%.17g", value);
-    return buffer;
+    return {buffer, std::to_chars(buffer, std::end(buffer), value).ptr};
 }
 
 /** The values of one element, each as text that tells any two apart. */
@@ -73,7 +78,7 @@ inline std::vector<std::string> values_of(const parElement& element) {
                 values.push_back(digits(static_cast<const double*>(element.pointer)[i]));
                 break;
             case parElement::typeFloat:
-                values.push_back(digits(static_cast<double>(static_cast<const float*>(element.pointer)[i])));
+                values.push_back(digits(static_cast<const float*>(element.pointer)[i]));
                 break;
             case parElement::typeInt:
                 values.push_back(std::to_string(static_cast<const std::int32_t*>(element.pointer)[i]));
@@ -156,6 +161,63 @@ inline void expect_fields(const GeneralSAR_BaseXML& object, std::span<const Fiel
         const std::string value = row.type == parElement::typeString ? row.text : digits(row.number);
         EXPECT_EQ(values_of(element), std::vector<std::string>(static_cast<std::size_t>(row.count), value));
     }
+}
+
+/** The lines of a table of the test data, each cut at the separator into at most `columns` texts. */
+inline std::vector<std::vector<std::string>> read_table(const std::string& name, char separator = ',',
+                                                        std::size_t columns = 100) {
+    std::ifstream file{QUO_TEST_DATA + ("/" + name)};
+    EXPECT_TRUE(file) << name;
+    std::vector<std::vector<std::string>> rows;
+    for (std::string line; std::getline(file, line);) {
+        if (line.starts_with('#')) continue;
+        std::vector<std::string>& row = rows.emplace_back();
+        for (auto end = line.find(separator); end != line.npos && row.size() + 1 < columns;
+             end = line.find(separator)) {
+            row.push_back(line.substr(0, end));
+            line.erase(0, end + 1);
+        }
+        row.push_back(line);
+    }
+    errno = 0;
+    return rows;
+}
+
+/** What is promised of a field. */
+struct ListedField {
+    std::string key;          ///< in parameter files; "-" where it is not read from them, empty where none is read
+    bool mandatory;           ///< in parameter files
+    std::string description;  ///< see described()
+};
+
+/** The listed fields of a class, in order. */
+inline std::vector<ListedField> listed_fields(const std::string& name) {
+    std::vector<ListedField> fields;
+    for (const auto& row : read_table("objects/fields.csv", ',', 4))
+        if (row[0] == name) fields.push_back({row[1], row[2] == "mandatory", row[3]});
+    return fields;
+}
+
+/** Which values of an element make sense: "]0 inf]", "filled", "listed A|B". */
+inline std::string described(const parRule& rule) {
+    constexpr const char* kTexts[] = {"", "filled", "listed", "date"};
+    std::string text = kTexts[rule.text];
+    if (rule.bounded)
+        text += (rule.above_lowest ? "]" : "[") + digits(rule.lowest) + " " + digits(rule.highest) + "]";
+    for (const std::string_view word : rule.texts) text.append("|").append(word);
+    return text;
+}
+
+/** An element as it stands in a new object: "name,type,count,minimum,maximum,presence,default,rule". */
+inline std::string described(const parElement& element) {
+    constexpr const char* kTypes[] = {"double", "float", "int", "text", "none"};
+    std::string text = element.name + std::string{","} + kTypes[element.type];
+    if (element.type == parElement::typeString) text += "[" + std::to_string(element.room) + "]";
+    text += "," + std::to_string(element.count) + "," + digits(element.minimum) + "," + digits(element.maximum) +
+            (element.mandatory ? ",mandatory," : ",optional,");
+    for (std::string separator; const std::string& value : values_of(element))
+        text += std::exchange(separator, " ") + value;
+    return text + "," + described(element.rule);
 }
 
 /** The object as one section of a parameter file, under the promised keys; `left_out` is a key to leave out and

@@ -1,0 +1,122 @@
+#include "quo_base/acquisition.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <complex>
+#include <filesystem>
+#include <numbers>
+#include <string>
+#include <vector>
+
+#include "quo_base/datafile.h"
+#include "support/diagnostics.h"
+#include "support/fields.h"
+#include "support/raster.h"
+
+namespace {
+
+// A text longer than its member must not run into the next one.
+TEST(AcquisitionObjects, CutLongTextsToTheirMembers) {
+    const test::TemporaryFolder folder;
+    const std::string file = folder.file("windows.par"), longest(511, 'w');
+    test::write_text(file, "[SpectralWindows]\nAzMatchedFilterType = " + longest +
+                               "xyz\nRgMatchedFilterType = HAMMING\nRgMatchedFilterCoef = 0.75\n"
+                               "AzMatchedFilterCoef = 0.54\nRgLookBandwidth = 17.5\nAzLookBandwidth = 1378.25\n");
+    SpectralWindows_Obj windows;
+    EXPECT_EQ(windows.readhdr(file.c_str()), 0);
+    EXPECT_EQ(windows.AzMatchedFilterType, longest);
+    EXPECT_STREQ(windows.RgMatchedFilterType, "HAMMING");
+}
+
+SARPulse_Obj& set(SARPulse_Obj& pulse, double length, double bandwidth, double rate) {
+    pulse.PulseLength = length;
+    pulse.Bandwidth = bandwidth;
+    pulse.PulseSamplingRate = rate;
+    return pulse;
+}
+
+constexpr fcomplex kGuard{17.3F, -3.7F};
+
+TEST(Chirp, FollowsTheQuadraticPhase) {
+    const struct {
+        double length_s, bandwidth_hz, rate_hz;
+        int samples;
+    } rows[] = {{10e-6, 15.3e6, 20e6, 200}, {1e-6, 0.3e6, 1.2e6, 1},       {12.5, 0.7, 1.0, 13},
+                {12.4999, 0.7, 1.0, 12},    {10e-6, -15.3e6, 20.3e6, 203}, {100e-6, 300e6, 600e6, 60000},
+                {17e-6, 0.0, 1e6, 17}};
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.samples);
+        SARPulse_Obj pulse;
+        pulse.PulseKRate = 5.5e11;  // described, not used
+        pulse.PulseEnergy = 17.3;
+        ASSERT_EQ(set(pulse, row.length_s, row.bandwidth_hz, row.rate_hz).chirpSamples(), row.samples);
+        std::vector<fcomplex> chirp(static_cast<std::size_t>(row.samples) + 1, kGuard);
+        ASSERT_EQ(pulse.generateChirp(chirp.data()), 0);
+        EXPECT_EQ(chirp.back(), kGuard) << "written beyond the last sample";
+        chirp.pop_back();
+        EXPECT_EQ(chirp, std::vector<fcomplex>(chirp.rbegin(), chirp.rend())) << "symmetric to the last bit";
+        const double amplitude = std::sqrt(std::abs(row.bandwidth_hz) / row.rate_hz / row.samples);
+        for (int n = 0; n < row.samples; ++n) {
+            // In half samples from the middle the offset is a whole number: no rounding enters before the last
+            // step.
+            const double half_steps = 2.0 * n - (row.samples - 1);
+            const double turns =
+                row.bandwidth_hz / row.length_s * half_steps * half_steps / (8.0 * row.rate_hz * row.rate_hz);
+            const double angle = 2.0 * std::numbers::pi * (turns - std::floor(turns));
+            const fcomplex sample = chirp[static_cast<std::size_t>(n)];
+            ASSERT_NEAR(sample.real(), amplitude * std::cos(angle), 1e-6 * amplitude) << n;
+            ASSERT_NEAR(sample.imag(), amplitude * std::sin(angle), 1e-6 * amplitude) << n;
+        }
+    }
+}
+
+TEST(ChirpOfABadPulse, IsRefused) {
+    const test::Report report;
+    std::size_t refused = 0;
+    for (const auto& row : test::read_table("objects/bad_pulses.csv")) {
+        SARPulse_Obj pulse;
+        set(pulse, std::stod(row[1]), std::stod(row[2]), std::stod(row[3]));
+        fcomplex sample = kGuard;
+        EXPECT_EQ(pulse.chirpSamples(), 0) << row[0];
+        EXPECT_EQ(pulse.generateChirp(&sample), 1) << row[0];
+        EXPECT_EQ(sample, kGuard) << row[0];
+        EXPECT_EQ(report.entries("ERROR").size(), ++refused) << row[0];
+    }
+    SARPulse_Obj good;
+    EXPECT_EQ(set(good, 1e-5, 1e6, 2e7).generateChirp(nullptr), 1);
+    constexpr int kMost = SARPulse_Obj::kMaxChirpSamples;
+    EXPECT_EQ(set(good, 1.0, 1e6, kMost).chirpSamples(), kMost);
+    EXPECT_EQ(set(good, 1.0, 1e6, kMost + 1.0).chirpSamples(), 0);
+}
+
+TEST(WriteChirp, WritesTheChirpAsOneLineOfComplexFloats) {
+    const test::Report report;
+    const std::string file = report.file("chirp"), unmade = report.file("unmade");
+    SARPulse_Obj pulse, unknown;
+    set(pulse, 37.12e-6, 15.55e6, 18.962468e6);
+    ASSERT_EQ(pulse.writeChirp(file.c_str()), 0);
+    std::vector<fcomplex> chirp(704);
+    ASSERT_EQ(pulse.generateChirp(chirp.data()), 0);
+    std::string bytes;
+    for (const fcomplex& sample : chirp) {
+        test::append_bytes(bytes, sample.real(), false);
+        test::append_bytes(bytes, sample.imag(), false);
+    }
+    EXPECT_EQ(test::read_text(file), bytes);
+    DataFile raster;
+    ASSERT_EQ(raster.read_hdr(file.c_str()), 0);
+    EXPECT_THAT((std::vector<std::int64_t>{raster.NrOfPixelsPerLine, raster.NrOfLinesPerImage, raster.CellType,
+                                           raster.ByteOrder, raster.HeaderOffset, raster.RowPrefix}),
+                testing::ElementsAre(704, 1, FLOAT_COMPLEX, 0, 0, 0));
+
+    EXPECT_EQ(unknown.writeChirp(unmade.c_str()), 1);
+    EXPECT_FALSE(std::filesystem::exists(unmade));
+    EXPECT_EQ(pulse.writeChirp(report.file("no_such_folder/chirp").c_str()), 9);
+    EXPECT_EQ(pulse.writeChirp(std::string(512, 'n').c_str()), 1);
+    EXPECT_GE(report.entries("ERROR_CALL_TREE").size(), 3U);
+    test::fail_every_allocation([&] { return pulse.writeChirp(file.c_str()); });
+}
+
+}  // namespace
