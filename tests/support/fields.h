@@ -11,7 +11,6 @@
 #include <cstring>
 #include <fstream>
 #include <iterator>
-#include <span>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -22,45 +21,6 @@
 /** Header objects seen from outside: what their documentation promises, field by field, and the means to fill,
  * compare, print and damage them without knowing their class. */
 namespace test {
-
-enum class Presence { kMandatory, kOptional, kProfileOptional, kXmlOnly };
-
-/** What is promised of one field. */
-struct FieldRow {
-    const char* name;
-    parElement::ParameterType type;
-    int count;
-    double number;     // default of every value of a number
-    const char* text;  // default of a text
-    const char* key = name;
-    Presence presence = Presence::kMandatory;
-    double minimum = 0.0, maximum = 0.0;
-
-    [[nodiscard]] constexpr FieldRow keyed(const char* other) const {
-        FieldRow row = *this;
-        row.key = other;
-        return row;
-    }
-    [[nodiscard]] constexpr FieldRow is(Presence other) const {
-        FieldRow row = *this;
-        row.presence = other;
-        return row;
-    }
-    [[nodiscard]] bool mandatory_in_xml() const {
-        return presence == Presence::kMandatory || presence == Presence::kProfileOptional;
-    }
-    [[nodiscard]] bool mandatory_in_profile() const { return presence == Presence::kMandatory; }
-};
-
-constexpr FieldRow real(const char* name, double value = -999.0, int count = 1) {
-    return {name, parElement::typeDouble, count, value, ""};
-}
-constexpr FieldRow whole(const char* name, double value, double minimum = 0.0, double maximum = 0.0) {
-    return {name, parElement::typeInt, 1, value, "", name, Presence::kMandatory, minimum, maximum};
-}
-constexpr FieldRow text(const char* name, const char* value = "NOT_AVAILABLE") {
-    return {name, parElement::typeString, 1, 0.0, value};
-}
 
 /** The shortest text that tells a number from any other of its type. */
 template <typename Number>
@@ -144,25 +104,6 @@ inline std::vector<std::string> field_names(const GeneralSAR_BaseXML& object) {
     return names;
 }
 
-/** Compares a new object with what is promised: order, names, types, counts, bounds, which fields must be present,
- * defaults. */
-inline void expect_fields(const GeneralSAR_BaseXML& object, std::span<const FieldRow> rows) {
-    ASSERT_EQ(object.elementCount(), static_cast<int>(rows.size()));
-    for (int i = 0; i < object.elementCount(); ++i) {
-        const parElement& element = *object.element(i);
-        const FieldRow& row = rows[static_cast<std::size_t>(i)];
-        SCOPED_TRACE(row.name);
-        EXPECT_STREQ(element.name, row.name);
-        EXPECT_EQ(element.type, row.type);
-        EXPECT_EQ(element.count, row.count);
-        EXPECT_EQ(element.minimum, row.minimum);
-        EXPECT_EQ(element.maximum, row.maximum);
-        EXPECT_EQ(element.mandatory, row.mandatory_in_xml());
-        const std::string value = row.type == parElement::typeString ? row.text : digits(row.number);
-        EXPECT_EQ(values_of(element), std::vector<std::string>(static_cast<std::size_t>(row.count), value));
-    }
-}
-
 /** The lines of a table of the test data, each cut at the separator into at most `columns` texts. */
 inline std::vector<std::vector<std::string>> read_table(const std::string& name, char separator = ',',
                                                         std::size_t columns = 100) {
@@ -218,24 +159,6 @@ inline std::string described(const parElement& element) {
     for (std::string separator; const std::string& value : values_of(element))
         text += std::exchange(separator, " ") + value;
     return text + "," + described(element.rule);
-}
-
-/** The object as one section of a parameter file, under the promised keys; `left_out` is a key to leave out and
- * `cut_short` one whose list loses its last value. */
-inline std::string profile_text(const GeneralSAR_BaseXML& object, const char* section,
-                                std::span<const FieldRow> rows, std::string_view left_out = "",
-                                std::string_view cut_short = "") {
-    std::string file = "[" + std::string{section} + "]\n";
-    for (std::size_t i = 0; i < rows.size(); ++i) {
-        if (rows[i].key == left_out) continue;
-        std::vector<std::string> values = values_of(*object.element(static_cast<int>(i)));
-        const bool list = values.size() > 1;
-        if (rows[i].key == cut_short) values.pop_back();
-        std::string line;
-        for (const std::string& value : values) line += (line.empty() ? "" : " ") + value;
-        file += std::string{rows[i].key} + " = " + (list ? "{" + line + "}" : line) + "\n";
-    }
-    return file;
 }
 
 /** One element of a header file as written, tags included; empty when there is none. */
