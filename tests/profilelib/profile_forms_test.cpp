@@ -29,9 +29,9 @@ auto& [ints, wide, floats, doubles, text] = data;
 char* const strings[2] = {text, text};
 
 /** A function with all its arguments but the key. */
-template <typename Function, typename... Data>
-auto call(Function function, Data... data) {
-    return [=](const char* key) { return function("s", key, data..., kFile); };
+template <typename Function, typename... Arguments>
+auto call(Function function, Arguments... arguments) {
+    return [=](const char* key) { return function("s", key, arguments..., kFile); };
 }
 
 /** A wrapper, and what it says between its first words and the file when there is no value or no key. */

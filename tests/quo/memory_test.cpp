@@ -12,7 +12,7 @@ namespace {
 
 /** A scene's header with one more section. */
 std::string header_with(const std::string& section) {
-    std::string text = test::read_text(test::scene_file(test::scenes().front()));
+    std::string text = test::read_text(test::kScenes[0].path(".xml"));
     return text.insert(text.find("</Channel>"), section);
 }
 

@@ -273,7 +273,7 @@ constexpr Row<Owner> field(const char* name, Rules... rules) {
         row.type = type_of<std::remove_pointer_t<decltype(values_of(std::declval<Value&>()))>>();
         row.array = &kArrayKind<Value>;
     }
-    const auto apply = [&row](auto rule) {
+    [[maybe_unused]] const auto apply = [&row](auto rule) {
         if constexpr (std::convertible_to<decltype(rule), const char*>)
             row.key = rule;
         else

@@ -3,8 +3,8 @@
 #include <string>
 
 #include "diagnosticslib/call_frame.h"
-#include "generalSAR/objects/raster_name.h"
 #include "generalSAR/container/readable_file.h"
+#include "generalSAR/objects/raster_name.h"
 #include "profilelib/profile_look.h"
 #include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_session.h"

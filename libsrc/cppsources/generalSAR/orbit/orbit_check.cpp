@@ -7,8 +7,8 @@
 #include <numeric>
 #include <utility>
 
-#include "sarutillib/ground/bounded_text.h"
 #include "sarutillib/geometry/geometry_kernels.h"
+#include "sarutillib/ground/bounded_text.h"
 
 namespace quo {
 namespace {
