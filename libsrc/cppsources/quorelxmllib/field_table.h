@@ -47,7 +47,8 @@ struct Field {
     const char *unit = "", *meaning = "";
 
     void* (*member)(void* owner) = nullptr;
-    const ArrayKind* array = nullptr;  // of an array of any length
+    const ArrayKind* array = nullptr;          // of an array of any length
+    bool is_array = false, is_vector = false;  // the same, and whether it can be copied, for the compiler's checks
     std::int32_t* (*length)(void* owner) = nullptr;
     std::int32_t per_length = 0;  // values per unit of length; 0: no length is known
     std::int32_t most = 0;        // values that are believed, of an array that XML does not have; 0: XML has it
@@ -272,6 +273,8 @@ constexpr Row<Owner> field(const char* name, Rules... rules) {
     } else {
         row.type = type_of<std::remove_pointer_t<decltype(values_of(std::declval<Value&>()))>>();
         row.array = &kArrayKind<Value>;
+        row.is_array = true;
+        row.is_vector = requires(Value & to, const Value& from) { copy_array(to, from); };
     }
     [[maybe_unused]] const auto apply = [&row](auto rule) {
         if constexpr (std::convertible_to<decltype(rule), const char*>)
@@ -303,8 +306,8 @@ public:
     constexpr FieldTable(const char* section, Rows... rows) : section_{section}, fields_{rows...} {
         for (const Field& field : fields_) {
             if (std::string_view{field.name}.size() >= sizeof(parElement::name)) throw "element name too long";
-            if (field.array && field.per_length < 1) throw "array without QUO_LENGTH";
-            if (field.most > 0 && !(field.array && field.array->assign)) throw "no vector, and not in XML";
+            if (field.is_array && field.per_length < 1) throw "array without QUO_LENGTH";
+            if (field.most > 0 && !field.is_vector) throw "no vector, and not in XML";
             if (field.most == 0 && size_++ != &field - fields_.data()) throw "element behind one that XML lacks";
         }
     }
