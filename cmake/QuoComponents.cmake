@@ -90,7 +90,7 @@ function(quo_test name)
     set(target ${name}_test)
     add_executable(${target} ${arg_SOURCES})
     # Optimising the tests themselves takes longer than running them as they are.
-    set_property(SOURCE ${arg_SOURCES} APPEND PROPERTY COMPILE_OPTIONS $<$<NOT:$<CONFIG:Debug>>:${quo_test_level}>)
+    set_property(SOURCE ${arg_SOURCES} APPEND PROPERTY COMPILE_OPTIONS ${quo_test_level})
     target_include_directories(${target} PRIVATE "${PROJECT_SOURCE_DIR}/tests")
     target_compile_definitions(${target} PRIVATE QUO_TEST_DATA="${PROJECT_SOURCE_DIR}/tests/data")
     quo_link_components(${target} ${arg_COMPONENTS})

@@ -212,7 +212,8 @@ Run update_raster(Folder folder) {
             made->write("w", 1);
         }
         made->close();
-        if (!std::filesystem::is_regular_file(file)) return made->status();
+        std::error_code failed;  // the job's own look may be the one that fails
+        if (!std::filesystem::is_regular_file(file, failed)) return made->status();
         std::array<char, 64> now{};
         std::FILE* const stream = std::fopen(file, "rb");
         const std::size_t there = stream ? std::fread(now.data(), 1, now.size(), stream) : 0;
