@@ -5,32 +5,28 @@
 #include <cstdio>
 #include <cstring>
 #include <numbers>
-#include <stdexcept>
 #include <string>
 #include <vector>
 
-#include "common/apart.h"
-#include "quo_base/generalSAR.h"
+#include "common/session.h"
 
 namespace {
 
 constexpr int kFirstLine = 6000, kFirstSample = 9000, kLines = 500, kSamples = 1000;  // what is taken of the scene
 
-void require(bool fine, const char* what) {
-    if (!fine) throw std::runtime_error{what};
-}
+using example::require;
 
 // --- The header -----------------------------------------------------------------------------------------------
 
 // Orbit, sampling and description come from the scene, the region is a part of the scene's.
 void take_over(GeneralSAR& scene, GeneralSAR& product) {
-    require(scene.GSclone(&product) == 0, "the scene cannot be copied");
+    require(scene.GSclone(&product), "the scene cannot be copied");
     ROI_Coords part;
     part.FirstLine = kFirstLine;
     part.FirstSample = kFirstSample;
     part.Lines = kLines;
     part.Samples = kSamples;
-    require(part.GetROI(&scene.roi.Roi, &product.roi.Roi) == 0, "the scene has no region");
+    require(part.GetROI(&scene.roi.Roi, &product.roi.Roi), "the scene has no region");
 
     DataSetInfo_Obj& info = product.dataSetInfo;
     info.SetUnitType(DataSetInfo_Obj::dsVoltComplex);
@@ -52,7 +48,7 @@ void describe_instrument(GeneralSAR& product) {
 
     SensorAttitude_Obj& attitude = product.sensorAttitude;
     const ROI_Time middle = product.roi.Roi.GetCenter();
-    require(product.orbit.SVGetSatSpeed(middle.SlowTime, middle.FastTime, &attitude.Eq_speed) == 0, "no speed");
+    require(product.orbit.SVGetSatSpeed(middle.SlowTime, middle.FastTime, &attitude.Eq_speed), "no speed");
     attitude.Eq_distance = middle.FastTime * quo::kLightSpeed / 2.0;
     attitude.Mean_DC = 0.0;
     attitude.SquintAngle = 0.0;
@@ -81,18 +77,16 @@ void describe_instrument(GeneralSAR& product) {
 void derive_geometry(GeneralSAR& product) {
     const ROI_Obj& region = product.roi.Roi;
     polySAR& set = product.polynomials;
-    require(set.CreatePolys(2, 1, 1, 1, 1, 1) == 0, "no memory");
+    require(set.CreatePolys(2, 1, 1, 1, 1, 1), "no memory");
     for (int i = 0; i < 2; ++i) {  // at the beginning and at the end: the image is at zero Doppler
         set.DC[i].trg0 = region.FastStartTime;
         set.DC[i].taz0 = region.SlowStartTime + i * region.SlowTimeLength;
     }
     const polyDC& dc = set.DC[0];
-    require(product.orbit.SVGetFRpoly(&region, &dc, &set.FR[0]) == 0, "no FM rate");
-    require(product.orbit.SVGetGroundToTimePolys(&region, &dc, &set.SL2GR[0], &set.GR2SL[0]) == 0,
-            "no ground range");
-    require(product.orbit.SVGetTimeToAnglesPolys(&region, &dc, &set.SL2THETA[0], &set.SL2PHI[0]) == 0,
-            "no angles");
-    require(product.orbit.SVGetGeoCoords(&product.geoCoords, &product.roi) == 0, "no corners");
+    require(product.orbit.SVGetFRpoly(&region, &dc, &set.FR[0]), "no FM rate");
+    require(product.orbit.SVGetGroundToTimePolys(&region, &dc, &set.SL2GR[0], &set.GR2SL[0]), "no ground range");
+    require(product.orbit.SVGetTimeToAnglesPolys(&region, &dc, &set.SL2THETA[0], &set.SL2PHI[0]), "no angles");
+    require(product.orbit.SVGetGeoCoords(&product.geoCoords, &product.roi), "no corners");
     product.geoCoords.EastingGridSize = product.geoCoords.NorthingGridSize = 30.0;
 
     // One gain for every sample, between the look angles of the region's ends.
@@ -130,7 +124,7 @@ std::vector<fcomplex> make_image(GeneralSAR& product) {
             const double range = region.FastStartTime + sample * region.FastTimeDelta;
             double latitude = 0.0, longitude = 0.0;
             require(product.orbit.SVGetLatLon(region.SlowStartTime + line * region.SlowTimeDelta, range, &latitude,
-                                              &longitude) == 0,
+                                              &longitude),
                     "a sample sees no ground");
             const double amplitude =
                 near_a_line_of_the_map(latitude) || near_a_line_of_the_map(longitude) ? 3000 : 300;
@@ -160,26 +154,16 @@ struct Comparison {
 
 private:
     static bool same(const parElement& a, const parElement& b) {
-        const auto count = static_cast<std::size_t>(a.count);
-        switch (a.type) {
-            case parElement::typeDouble:
-                return std::memcmp(a.pointer, b.pointer, count * sizeof(double)) == 0;
-            case parElement::typeFloat:
-                return std::memcmp(a.pointer, b.pointer, count * sizeof(float)) == 0;
-            case parElement::typeInt:
-                return std::memcmp(a.pointer, b.pointer, count * sizeof(std::int32_t)) == 0;
-            case parElement::typeString:
-                return std::strcmp(static_cast<const char*>(a.pointer), static_cast<const char*>(b.pointer)) == 0;
-            case parElement::typeNone:
-                break;
-        }
-        return count == 0;
+        if (a.type == parElement::typeString)
+            return std::strcmp(static_cast<const char*>(a.pointer), static_cast<const char*>(b.pointer)) == 0;
+        // A float is as long as an int.
+        const std::size_t size = a.type == parElement::typeDouble ? sizeof(double) : sizeof(std::int32_t);
+        return a.count == 0 || std::memcmp(a.pointer, b.pointer, size * static_cast<std::size_t>(a.count)) == 0;
     }
 };
 
 void compare_polynomials(const polySAR& written, const polySAR& read, Comparison& comparison) {
-    require(read.ndc == written.ndc && read.nfr == written.nfr && read.nsl2gr == written.nsl2gr,
-            "polynomials are lost");
+    if (comparison.different > 0) return;  // the lists may be of other lengths
     for (int i = 0; i < written.ndc; ++i) comparison.add("DC", written.DC[i], read.DC[i]);
     comparison.add("FR", written.FR[0], read.FR[0]);
     comparison.add("SL2GR", written.SL2GR[0], read.SL2GR[0]);
@@ -192,7 +176,7 @@ Comparison compare(GeneralSAR& written, GeneralSAR& read) {
     Comparison comparison;
     for (int i = 0; i < GeneralSAR::kObjects; ++i) {
         const auto object = static_cast<GSObject>(i);
-        require(read.GSexists(object), "an object is lost");
+        require(read.GSexists(object) ? QUO_OK : QUO_REFUSED, "an object is lost");
         comparison.add(std::to_string(i).c_str(), *written.GSget(object), *read.GSget(object));
     }
     comparison.add("ROI", written.roi.Roi, read.roi.Roi);
@@ -218,10 +202,9 @@ void write(GeneralSAR& product, const std::vector<fcomplex>& image, const std::s
     product.GSwrite((raster + ".hdr").c_str());
 }
 
-int run(const char* scene_header, const std::string& raster) {
-    example::require_apart({{scene_header}, {raster, raster + ".hdr"}});
+void run(const std::string& scene_header, const std::string& raster) {
     GeneralSAR scene, product;
-    require(scene.GSread(scene_header) == 0 && scene.GSexists(gsOrbit), "the scene cannot be read");
+    require(scene.GSread(scene_header.c_str()), "the scene cannot be read");
     take_over(scene, product);
     describe_instrument(product);
     derive_geometry(product);
@@ -230,7 +213,7 @@ int run(const char* scene_header, const std::string& raster) {
     write(product, image, raster);
 
     GeneralSAR read;
-    require(read.GSread((raster + ".hdr").c_str()) == 0, "the product cannot be read");
+    require(read.GSread((raster + ".hdr").c_str()), "the product cannot be read");
     const Comparison comparison = compare(product, read);
     std::vector<fcomplex> samples(image.size());
     read.bufferFile.open(BufferFile::READ);  // named by its header
@@ -239,7 +222,7 @@ int run(const char* scene_header, const std::string& raster) {
     for (std::size_t i = 0; i < image.size(); ++i) different += samples[i] == image[i] ? 0U : 1U;
     std::printf("%d objects: %d values written, %d differ when read; %zu samples, %zu differ\n",
                 GeneralSAR::kObjects, comparison.values, comparison.different, image.size(), different);
-    return comparison.different == 0 && different == 0 ? 0 : 1;
+    if (comparison.different != 0 || different != 0) throw example::Failure{"the product was not read as it was"};
 }
 
 }  // namespace
@@ -249,10 +232,7 @@ int main(int argc, char** argv) {
         std::fputs("Usage: example_complete_product SCENE.xml RASTER\n", stderr);
         return 2;
     }
-    try {
-        return run(argv[1], argv[2]);
-    } catch (const std::exception& failure) {
-        std::fprintf(stderr, "complete_product: %s\n", failure.what());
-        return 1;
-    }
+    const std::string scene = argv[1], raster = argv[2];
+    return example::run_program("complete_product", {{scene}, {raster, raster + ".hdr"}}, "", "", 0,
+                                [&] { run(scene, raster); });
 }

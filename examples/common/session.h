@@ -1,30 +1,60 @@
 #ifndef QUO_EXAMPLES_SESSION_H
 #define QUO_EXAMPLES_SESSION_H
 
+#include <algorithm>
+#include <cerrno>
 #include <cstdio>
 #include <exception>
+#include <filesystem>
 #include <stdexcept>
 #include <string>
+#include <vector>
 
-#include "apart.h"
 #include "quo_base/ckerr.h"
+#include "quo_base/generalSAR.h"
 #include "quo_base/quorelReport.h"
 
 namespace example {
 
-/** A job that cannot be done: what failed, and the library's status. */
+/** A job that cannot be done. */
 class Failure : public std::runtime_error {
-public:
-    explicit Failure(const std::string& what, int status = QUO_REFUSED) : runtime_error{what}, status_{status} {}
-    [[nodiscard]] int status() const { return status_; }
-
-private:
-    int status_;
+    using std::runtime_error::runtime_error;
 };
 
 /** Turns a failing status of the library into a Failure. */
 inline void require(int status, const std::string& what) {
-    if (status != QUO_OK) throw Failure{what + " (status " + std::to_string(status) + ")", status};
+    if (status != QUO_OK) throw Failure{what + " (status " + std::to_string(status) + ")"};
+}
+
+/** Makes a product header anew from the objects that the product has; throws Failure. */
+inline void write_product(GeneralSAR& product, const std::string& header) {
+    std::error_code failure;
+    std::filesystem::remove(header, failure);
+    errno = 0;  // what that left would count as an error of the next function of the library
+    quorelxml::setExactNumbers(true);  // 15 digits would cost the azimuth times their last microsecond
+    product.GSwrite(header.c_str());   // 0 whatever happens
+    if (!std::filesystem::exists(header, failure)) throw Failure{header + ": cannot be written"};
+}
+
+/** The files that a program reads and those that it writes. */
+struct Files {
+    std::vector<std::string> read, written;
+};
+
+/** Throws where a file to be written is one that is read, by whatever name or link, or stands there twice: the
+ * program would destroy what it needs. Names of no file yet are apart from all. */
+inline void require_apart(const Files& files) {
+    std::error_code error;
+    const auto same = [&](const std::string& a, const std::string& b) {
+        return a == b || (std::filesystem::is_regular_file(a, error) && std::filesystem::equivalent(a, b, error));
+    };
+    std::vector<std::string> others = files.read;
+    for (const std::string& name : files.written) {
+        if (std::ranges::any_of(others, [&](const std::string& other) { return same(name, other); }))
+            throw Failure{name + ": would replace a file that the program needs"};
+        others.push_back(name);
+    }
+    errno = 0;  // what looking left would count as an error of the next function of the library
 }
 
 /** The report and the log of a program, open as long as the object lives. Blocks that were allocated in between
@@ -38,7 +68,7 @@ public:
         init_report(report.c_str(), title, level);
         if (ckflg_report() == 0) {
             exit_ckerr();
-            throw Failure{report + ": the report cannot be written", QUO_NOT_OPENED};
+            throw Failure{report + ": the report cannot be written"};
         }
         if (!log.empty()) init_log(log.c_str(), title, level);
     }
@@ -68,6 +98,7 @@ int run_program(const char* title, Files files, const std::string& report, const
             quorelReport::addEntry(&failure);
             std::fprintf(stderr, "%s: %s\n", title, failure.what());
         } catch (const std::exception& failure) {
+            if (ckflg_report() == 0) throw;  // an entry shows itself on the standard error stream too
             quorelReport::addEntry(QUO_ERROR, __LINE__, __FILE__, title, "%s", failure.what());
         }
     } catch (const std::exception& failure) {

@@ -27,7 +27,7 @@ Target parse_target(const std::string& line) {
 
 std::vector<Target> read_targets(const std::string& file) {
     std::ifstream stream{file};
-    if (!stream) throw Failure{file + ": cannot be read", QUO_NOT_OPENED};
+    if (!stream) throw Failure{file + ": cannot be read"};
     std::vector<Target> targets;
     bool names_passed = false;
     for (std::string line; std::getline(stream, line);) {

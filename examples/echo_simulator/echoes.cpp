@@ -8,7 +8,6 @@
 #include <numbers>
 #include <random>
 
-#include "../common/product.h"
 #include "../common/session.h"
 #include "quo_base/generalSAR.h"
 
@@ -211,7 +210,7 @@ void write_raster(const EchoJob& job, const std::vector<Sight>& sights, GeneralS
     const auto samples = static_cast<std::size_t>(product.roi.Roi.Samples);
     Noise noise{job.noise, job.seed};
     raster.open(BufferFile::WRITE);
-    if (!raster.is_open()) throw Failure{job.raster + ": cannot be written", QUO_NOT_OPENED};
+    if (!raster.is_open()) throw Failure{job.raster + ": cannot be written"};
     for (int first = 0; first < product.roi.Roi.Lines; first += kLinesInBlock) {
         const int lines = std::min(kLinesInBlock, product.roi.Roi.Lines - first);
         std::vector<fcomplex> block(static_cast<std::size_t>(lines) * samples);

@@ -131,7 +131,7 @@ Finder::Finder(const std::string& image) {
         if (!product_.GSexists(object)) throw Failure{header + ": a section is missing"};
     product_.bufferFile.setFilename(image.c_str());
     product_.bufferFile.open(BufferFile::READ);
-    if (!product_.bufferFile.is_open()) throw Failure{image + ": cannot be read", QUO_NOT_OPENED};
+    if (!product_.bufferFile.is_open()) throw Failure{image + ": cannot be read"};
 }
 
 Measurement Finder::find(const Target& target) {

@@ -177,4 +177,16 @@ void AzimuthFocusing::filter_columns() {
             turn(block_.line(bin), block_.samples(), -middle, 1.0, column_phase(doppler_hz(bin)));
 }
 
+void AzimuthFocusing::focus(GeneralSAR& product, RangeHistories& histories, double range_s, double azimuth_s,
+                            Stopwatch& watch) {
+    watch.time(kTransforms, [this] { forward_.run(block_); });
+    watch.time(kFilters, [&] {
+        aim(product, histories, range_s, azimuth_s);
+        filter_middle();
+    });
+    watch.time(kTransforms, [this] { inverse_range_.run(block_); });
+    watch.time(kFilters, [this] { filter_columns(); });
+    watch.time(kTransforms, [this] { inverse_azimuth_.run(block_); });
+}
+
 }  // namespace example

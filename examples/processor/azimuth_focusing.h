@@ -7,6 +7,7 @@
 #include "quo_base/generalSAR.h"
 #include "quo_base/generalSAR_configuration.h"
 #include "range_histories.h"
+#include "stopwatch.h"
 #include "transform.h"
 
 namespace example {
@@ -53,18 +54,15 @@ class AzimuthFocusing {
 public:
     AzimuthFocusing(const BlockLayout& layout, const DopplerBand& band, double range_step_s);
 
-    /** Where the data is to be put before transform(). */
+    /** Where the data is to be put before focus(), and where the image is afterwards. */
     [[nodiscard]] Block& block() { return block_; }
-    /** Names the block at hand: range time of its first sample. */
-    void aim(GeneralSAR& product, RangeHistories& histories, double range_s, double azimuth_s);
-
-    void transform() { forward_.run(block_); }  // both frequencies
-    void filter_middle();                       // for the middle range
-    void transform_range() { inverse_range_.run(block_); }
-    void filter_columns();  // the rest of each column
-    void transform_azimuth() { inverse_azimuth_.run(block_); }
+    /** Focuses the block, whose first sample has this range time, with the Doppler of this azimuth time. */
+    void focus(GeneralSAR& product, RangeHistories& histories, double range_s, double azimuth_s, Stopwatch& watch);
 
 private:
+    void aim(GeneralSAR& product, RangeHistories& histories, double range_s, double azimuth_s);
+    void filter_middle();   // for the middle range, in both frequencies
+    void filter_columns();  // the rest of each column
     [[nodiscard]] double doppler_hz(int bin) const;
     [[nodiscard]] RowPhase middle_phase(double doppler_hz) const;
     [[nodiscard]] RowPhase column_phase(double doppler_hz) const;

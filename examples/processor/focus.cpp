@@ -2,13 +2,11 @@
 
 #include <algorithm>
 #include <cstdint>
-#include <cstdio>
 #include <filesystem>
 #include <optional>
 
-#include "../common/product.h"
-#include "../common/progress.h"
 #include "azimuth_focusing.h"
+#include "quo_base/debugIO.h"
 #include "quo_base/generalSAR.h"
 #include "range_compression.h"
 
@@ -17,35 +15,58 @@ namespace {
 
 constexpr double kRangeShare = 0.3;  // of the time that range compression takes, about
 
+/** Tells a parent process, which draws a waitbar, how far the job has come. */
+class Waitbar {
+public:
+    explicit Waitbar(bool wanted) : wanted_{wanted} {
+        if (wanted_) waitbar_open("Focusing");
+    }
+    ~Waitbar() {
+        if (wanted_) waitbar_close();
+    }
+    Waitbar(const Waitbar&) = delete;
+    Waitbar& operator=(const Waitbar&) = delete;
+
+    void show(double share) {
+        const int percent = static_cast<int>(100.0 * share);
+        if (wanted_ && percent != percent_) waitbar_update(static_cast<float>(percent) / 100.0F);
+        percent_ = percent;
+    }
+
+private:
+    bool wanted_;
+    int percent_ = -1;
+};
+
 /** One run of the processor. */
 class Processor {
 public:
     Processor(const FocusJob& job, const AzimuthConf& azimuth, const generalProcessingConf& processing)
-        : job_{job}, conf_{azimuth}, processing_{processing}, progress_{"Focusing", job.waitbar} {}
+        : job_{job}, conf_{azimuth}, processing_{processing}, progress_{job.waitbar} {}
     FocusResult run();
 
 private:
     void read_header();
     void check_memory(int lines, int samples) const;
-    void create(DataFile& raster);
+    void create(DataFile& raster, const std::string& name, int lines, int samples);
     void finish(DataFile& raster);
     void compress_range();
-    void read_raw(RangeCompression& compression, int first, int lines);
+    void read_raw(Block& block, int first, int lines);
     void focus_azimuth();
-    void focus_strip(AzimuthFocusing& focusing, DataFile& image, int strip_line);
-    void read_block(AzimuthFocusing& focusing, int first_line, int first_sample);
-    void write_block(AzimuthFocusing& focusing, DataFile& image, int line, int sample);
+    void focus_strip(AzimuthFocusing& focusing, int strip_line);
+    void read_block(Block& block, int first_line, int first_sample);
+    void write_block(Block& block, int line, int sample);
     void write_header();
 
     FocusJob job_;
     const AzimuthConf& conf_;
     const generalProcessingConf& processing_;
-    Progress progress_;
+    Waitbar progress_;
     Stopwatch stopwatch_;
     GeneralSAR product_;
     DopplerBand band_{};
     ROI_Obj data_;  // the compressed data
-    DataFile compressed_;
+    DataFile compressed_, image_;
     BlockLayout layout_{};
 };
 
@@ -60,7 +81,7 @@ void Processor::read_header() {
     std::error_code failure;
     const auto bytes = static_cast<std::int64_t>(std::filesystem::file_size(job_.raw, failure));
     if (failure || raw.rasterSize() < 0 || bytes < raw.rasterSize())
-        throw Failure{job_.raw + ": not as long as its header says", QUO_READ_FAILED};
+        throw Failure{job_.raw + ": not as long as its header says"};
     if (raw.getLines() != product_.roi.Roi.Lines || raw.getSamples() != product_.roi.Roi.Samples)
         throw Failure{header + ": raster and region differ in size"};
     const SamplingConstants_Obj& sampling = product_.samplingConstants;
@@ -75,29 +96,24 @@ void Processor::read_header() {
 void Processor::check_memory(int lines, int samples) const {
     const double megabytes = static_cast<double>(lines) * samples * sizeof(fcomplex) / 1048576.0;
     if (megabytes > processing_.Memory)
-        throw Failure{"a block takes " + std::to_string(static_cast<int>(megabytes) + 1) + " MB, more than Memory",
-                      QUO_NO_MEMORY};
+        throw Failure{"a block takes " + std::to_string(static_cast<int>(megabytes) + 1) +
+                      " MB, more than Memory"};
 }
 
-void describe(DataFile& raster, const std::string& name, int lines, int samples) {
+void Processor::create(DataFile& raster, const std::string& name, int lines, int samples) {
     require(raster.setFilename(name.c_str()), name + ": the name is too long");
     raster.NrOfLinesPerImage = lines;
     raster.NrOfPixelsPerLine = samples;
     raster.CellType = FLOAT_COMPLEX;
-}
-
-void Processor::create(DataFile& raster) {
-    stopwatch_.time(Work::kWriting,
-                    [&] { require(raster.open(1), std::string{raster.FileName} + ": cannot be written"); });
+    stopwatch_.time(kWriting, [&] { require(raster.open(1), name + ": cannot be written"); });
 }
 
 void Processor::finish(DataFile& raster) {
-    stopwatch_.time(Work::kWriting,
+    stopwatch_.time(kWriting,
                     [&] { require(raster.close(), std::string{raster.FileName} + ": cannot be written"); });
 }
 
-void Processor::read_raw(RangeCompression& compression, int first, int lines) {
-    Block& block = compression.block();
+void Processor::read_raw(Block& block, int first, int lines) {
     for (int line = 0; line < lines; ++line) {
         fcomplex* samples = block.line(line);
         product_.bufferFile.readbuffer(samples, first + line, 1, 0, 0);
@@ -111,26 +127,22 @@ void Processor::compress_range() {
     const std::int64_t block_size = std::int64_t{conf_.LinesInBlock} * conf_.SamplesInBlock;
     const int block_lines = static_cast<int>(std::clamp<std::int64_t>(block_size / raw_samples, 1, lines));
     check_memory(block_lines, raw_samples);
-    std::optional<RangeCompression> made;
-    stopwatch_.time(Work::kPlanning, [&] { made.emplace(product_.pulse, conf_, raw_samples, block_lines); });
-    RangeCompression& compression = *made;
+    std::optional<RangeCompression> compression;
+    stopwatch_.time(kPlanning, [&] { compression.emplace(product_.pulse, conf_, raw_samples, block_lines); });
 
     data_.SetSlowAxe(product_.roi.Roi.SlowStartTime, 1.0 / band_.prf_hz, lines);
-    data_.SetFastAxe(product_.roi.Roi.FastStartTime + compression.delay_s(), product_.roi.Roi.FastTimeDelta,
-                     compression.samples());
-    describe(compressed_, compressed_raster(job_), lines, data_.Samples);
-    create(compressed_);
+    data_.SetFastAxe(product_.roi.Roi.FastStartTime + compression->delay_s(), product_.roi.Roi.FastTimeDelta,
+                     compression->samples());
+    create(compressed_, compressed_raster(job_), lines, data_.Samples);
     product_.bufferFile.open(BufferFile::READ);
     for (int first = 0; first < lines; first += block_lines) {
         const int count = std::min(block_lines, lines - first);
-        stopwatch_.time(Work::kReading, [&] { read_raw(compression, first, count); });
-        stopwatch_.time(Work::kTransforms, [&] { compression.transform(); });
-        stopwatch_.time(Work::kFilters, [&] { compression.filter(); });
-        stopwatch_.time(Work::kTransforms, [&] { compression.transform_back(); });
-        stopwatch_.time(Work::kWriting, [&] {
+        stopwatch_.time(kReading, [&] { read_raw(compression->block(), first, count); });
+        compression->compress(stopwatch_);
+        stopwatch_.time(kWriting, [&] {
             BufferIO region{&compressed_, 0, data_.Samples, first, count, FLOAT_COMPLEX};
-            require(region.writebuffer(reinterpret_cast<const char*>(compression.block().data()),
-                                       compression.block().samples()),
+            require(region.writebuffer(reinterpret_cast<const char*>(compression->block().data()),
+                                       compression->block().samples()),
                     std::string{compressed_.FileName} + ": cannot be written");
         });
         progress_.show(kRangeShare * first / lines);
@@ -140,8 +152,7 @@ void Processor::compress_range() {
 }
 
 /** Reads what the raster has of a block; beyond its borders there are zeros. */
-void Processor::read_block(AzimuthFocusing& focusing, int first_line, int first_sample) {
-    Block& block = focusing.block();
+void Processor::read_block(Block& block, int first_line, int first_sample) {
     const int top = std::max(0, first_line), left = std::max(0, first_sample);
     const int bottom = std::min(data_.Lines, first_line + block.lines());
     const int right = std::min(data_.Samples, first_sample + block.samples());
@@ -155,14 +166,13 @@ void Processor::read_block(AzimuthFocusing& focusing, int first_line, int first_
 
 /** Writes the image lines of a block. The transforms are cyclic: the image line that would stand before the block
  * stands at its end. */
-void Processor::write_block(AzimuthFocusing& focusing, DataFile& image, int line, int sample) {
-    Block& block = focusing.block();
+void Processor::write_block(Block& block, int line, int sample) {
     const int lines = std::min(layout_.step_lines, layout_.lines - line);
     const int samples = std::min(layout_.step_samples, layout_.samples - sample);
     for (int done = 0; done < lines;) {
         const int place = ((done - layout_.lead_lines) % block.lines() + block.lines()) % block.lines();
         const int count = std::min(lines - done, block.lines() - place);
-        BufferIO region{&image, sample, samples, line + done, count, FLOAT_COMPLEX};
+        BufferIO region{&image_, sample, samples, line + done, count, FLOAT_COMPLEX};
         require(region.writebuffer(reinterpret_cast<const char*>(block.line(place) + layout_.guard_samples),
                                    block.samples()),
                 job_.image + ": cannot be written");
@@ -171,7 +181,7 @@ void Processor::write_block(AzimuthFocusing& focusing, DataFile& image, int line
 }
 
 /** Focuses the blocks of one strip of image lines, from near to far. */
-void Processor::focus_strip(AzimuthFocusing& focusing, DataFile& image, int strip_line) {
+void Processor::focus_strip(AzimuthFocusing& focusing, int strip_line) {
     const int line = layout_.first_line + strip_line;  // counted like raw lines
     ROI_Obj strip;
     data_.clone(&strip);
@@ -180,17 +190,10 @@ void Processor::focus_strip(AzimuthFocusing& focusing, DataFile& image, int stri
     RangeHistories histories{product_, strip, job_.height_m};
     for (int sample = 0; sample < layout_.samples; sample += layout_.step_samples) {
         const int first_sample = sample - layout_.guard_samples;
-        stopwatch_.time(Work::kReading, [&] { read_block(focusing, line + layout_.lead_lines, first_sample); });
-        stopwatch_.time(Work::kTransforms, [&] { focusing.transform(); });
-        stopwatch_.time(Work::kFilters, [&] {
-            focusing.aim(product_, histories, data_.FastStartTime + first_sample * data_.FastTimeDelta,
-                         strip.SlowStartTime + 0.5 * strip.SlowTimeLength);
-            focusing.filter_middle();
-        });
-        stopwatch_.time(Work::kTransforms, [&] { focusing.transform_range(); });
-        stopwatch_.time(Work::kFilters, [&] { focusing.filter_columns(); });
-        stopwatch_.time(Work::kTransforms, [&] { focusing.transform_azimuth(); });
-        stopwatch_.time(Work::kWriting, [&] { write_block(focusing, image, strip_line, sample); });
+        stopwatch_.time(kReading, [&] { read_block(focusing.block(), line + layout_.lead_lines, first_sample); });
+        focusing.focus(product_, histories, data_.FastStartTime + first_sample * data_.FastTimeDelta,
+                       strip.SlowStartTime + 0.5 * strip.SlowTimeLength, stopwatch_);
+        stopwatch_.time(kWriting, [&] { write_block(focusing.block(), strip_line, sample); });
         const double strips = (strip_line + layout_.step_lines * static_cast<double>(sample) / layout_.samples);
         progress_.show(kRangeShare + (1.0 - kRangeShare) * strips / layout_.lines);
     }
@@ -201,15 +204,14 @@ void Processor::focus_azimuth() {
     layout_ = lay_out(product_, conf_, data_, band_, job_.height_m);
     check_memory(layout_.block_lines, layout_.block_samples);
     std::optional<AzimuthFocusing> focusing;
-    stopwatch_.time(Work::kPlanning, [&] { focusing.emplace(layout_, band_, data_.FastTimeDelta); });
-    DataFile image;
-    describe(image, job_.image, layout_.lines, layout_.samples);
-    create(image);
+    stopwatch_.time(kPlanning, [&] { focusing.emplace(layout_, band_, data_.FastTimeDelta); });
+    create(image_, job_.image, layout_.lines, layout_.samples);
     require(compressed_.open(0), std::string{compressed_.FileName} + ": cannot be read");
-    for (int line = 0; line < layout_.lines; line += layout_.step_lines) focus_strip(*focusing, image, line);
+    for (int line = 0; line < layout_.lines; line += layout_.step_lines) focus_strip(*focusing, line);
     require(compressed_.close(), std::string{compressed_.FileName} + ": cannot be closed");
-    finish(image);
-    if (processing_.EraseTemp != 0) stopwatch_.time(Work::kWriting, [&] { std::remove(compressed_.FileName); });
+    finish(image_);
+    if (processing_.EraseTemp != 0)
+        stopwatch_.time(kWriting, [&] { std::filesystem::remove(compressed_.FileName); });
 }
 
 /** Writes the image's product header: that of the raw data, with what focusing changed. */
@@ -224,14 +226,8 @@ void Processor::write_header() {
     product.spectralWindows.AzLookBandwidth = band_.width_hz;
     product.spectralWindows.RgLookBandwidth = product.samplingConstants.Brg_hz;
     require(product.orbit.SVGetGeoCoords(&product.geoCoords, &product.roi), "the image's corners");
-    BufferFile& raster = product.bufferFile;
-    raster.setFilename(job_.image.c_str());
-    raster.setLines(layout_.lines);
-    raster.setSamples(layout_.samples);
-    raster.setRowPrefix(0);
-    raster.setType(FLOAT_COMPLEX);
-    raster.HeaderOffset = 0;
-    raster.ByteOrder = 0;
+    product.bufferFile.setFilename(job_.image.c_str());
+    product.bufferFile.copyDescription(image_);
 
     product.GSdisable(gsDataFile);  // the same section as the raster's
     product.GSenable(gsSpectralWindows);

@@ -8,33 +8,17 @@
 
 namespace {
 
-void print_profile(const example::FocusResult& result) {
-    using example::Work;
-    const example::Stopwatch& watch = result.stopwatch;
-    struct Row {
-        const char* name;
-        Work work;
-    };
-    constexpr Row kRows[] = {{"planning transforms", Work::kPlanning},
-                             {"reading", Work::kReading},
-                             {"writing", Work::kWriting},
-                             {"transforms", Work::kTransforms},
-                             {"filters", Work::kFilters}};
+void print_profile(const example::Stopwatch& watch) {
     const double total_s = watch.total();
     double rest_s = total_s;
-    for (const Row& row : kRows) {
-        rest_s -= watch.seconds(row.work);
-        std::printf("  %-20s %8.3f s %6.1f %%\n", row.name, watch.seconds(row.work),
-                    100.0 * watch.seconds(row.work) / total_s);
+    const auto print = [=](const char* name, double seconds) {
+        std::printf("  %-20s %8.3f s %6.1f %%\n", name, seconds, 100.0 * seconds / total_s);
+    };
+    for (std::size_t work = 0; work < example::kWorks; ++work) {
+        rest_s -= watch.seconds(work);
+        print(example::kWorkNames[work], watch.seconds(work));
     }
-    std::printf("  %-20s %8.3f s %6.1f %%\n", "the rest", rest_s, 100.0 * rest_s / total_s);
-}
-
-void run(const example::FocusJob& job, const AzimuthConf& azimuth, const generalProcessingConf& processing) {
-    const example::FocusResult result = example::focus(job, azimuth, processing);
-    std::printf("%s: %d lines of %d samples, focused in blocks of %d by %d\n", job.image.c_str(), result.lines,
-                result.samples, result.block_lines, result.block_samples);
-    if (processing.Verbose != 0) print_profile(result);
+    print("the rest", rest_s);
 }
 
 }  // namespace
@@ -55,16 +39,17 @@ int main(int argc, char** argv) {
     AzimuthConf azimuth;
     generalProcessingConf processing;
     const std::string report = job.image + ".report.txt", log = job.image + ".log.txt";
-    const std::string compressed = example::compressed_raster(job);
     const example::Files files{{job.raw, job.raw + ".hdr", configuration},
-                               {job.image, job.image + ".hdr", compressed}};
+                               {job.image, job.image + ".hdr", example::compressed_raster(job)}};
     return example::run_program("Processor", files, report, log, processing.ReportLevel, [&] {
         if (!configuration.empty()) {
             azimuth.readpar(configuration.c_str(), 1);
             processing.readpar(configuration.c_str(), 1);
         }
-        if (verbose) processing.Verbose = 1;
-        run(job, azimuth, processing);
+        const example::FocusResult result = example::focus(job, azimuth, processing);
+        std::printf("%s: %d lines of %d samples, focused in blocks of %d by %d\n", job.image.c_str(), result.lines,
+                    result.samples, result.block_lines, result.block_samples);
+        if (verbose || processing.Verbose != 0) print_profile(result.stopwatch);
         quo_add_log(("focused " + job.raw + " into " + job.image).c_str());
     });
 }

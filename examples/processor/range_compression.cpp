@@ -41,37 +41,35 @@ void RangeCompression::prepare_filter(const std::vector<fcomplex>& replica, cons
     std::copy(replica.begin(), replica.end(), filter_.data());
     Transform{1, length, +1, 0}.run(filter_);
 
-    const double band_hz =
-        conf.RangeLookBandwidth > 0.0F ? static_cast<double>(conf.RangeLookBandwidth) : pulse.PulseSamplingRate;
+    const auto hamming = static_cast<double>(conf.RangeWindowHammingParameter);
+    const auto look_hz = static_cast<double>(conf.RangeLookBandwidth);
+    const double band_hz = std::min(look_hz > 0.0 ? look_hz : pulse.PulseSamplingRate, std::abs(pulse.Bandwidth));
+    const auto weight = [&](int k) {
+        const double frequency_hz = (2 * k < length ? k : k - length) * pulse.PulseSamplingRate / length;
+        return look_hz > 0.0 || hamming > 0.0 ? band_weight(frequency_hz, band_hz, hamming) : 1.0;
+    };
     double gain = 0.0, energy = 0.0, weighted = 0.0;
     for (const fcomplex sample : replica) gain += static_cast<double>(std::abs(sample));
-    std::vector<double> weights(static_cast<std::size_t>(length));
     for (int k = 0; k < length; ++k) {
-        const double frequency_hz = (2 * k < length ? k : k - length) * pulse.PulseSamplingRate / length;
-        double& weight = weights[static_cast<std::size_t>(k)];
-        weight = conf.RangeLookBandwidth > 0.0F || conf.RangeWindowHammingParameter > 0.0F
-                     ? band_weight(frequency_hz, std::min(band_hz, std::abs(pulse.Bandwidth)),
-                                   static_cast<double>(conf.RangeWindowHammingParameter))
-                     : 1.0;
-        energy += static_cast<double>(std::norm(filter_.data()[k]));
-        weighted += weight * static_cast<double>(std::norm(filter_.data()[k]));
+        const auto power = static_cast<double>(std::norm(filter_.data()[k]));
+        energy += power;
+        weighted += weight(k) * power;
     }
     const double scale = energy / (weighted * gain * length);
     for (int k = 0; k < length; ++k)
-        filter_.data()[k] =
-            std::conj(filter_.data()[k]) * static_cast<float>(scale * weights[static_cast<std::size_t>(k)]);
+        filter_.data()[k] = std::conj(filter_.data()[k]) * static_cast<float>(scale * weight(k));
 }
 
 void RangeCompression::filter() {
-    const auto* by = reinterpret_cast<const float*>(filter_.data());
-    for (int line = 0; line < block_.lines(); ++line) {
-        auto* parts = reinterpret_cast<float*>(block_.line(line));
-        for (int k = 0; k < 2 * block_.samples(); k += 2) {
-            const float real = parts[k] * by[k] - parts[k + 1] * by[k + 1];
-            parts[k + 1] = parts[k] * by[k + 1] + parts[k + 1] * by[k];
-            parts[k] = real;
-        }
-    }
+    for (int line = 0; line < block_.lines(); ++line)
+        std::transform(block_.line(line), block_.line(line) + block_.samples(), filter_.data(), block_.line(line),
+                       product<float>);
+}
+
+void RangeCompression::compress(Stopwatch& watch) {
+    watch.time(kTransforms, [this] { forward_.run(block_); });
+    watch.time(kFilters, [this] { filter(); });
+    watch.time(kTransforms, [this] { inverse_.run(block_); });
 }
 
 }  // namespace example

@@ -5,6 +5,7 @@
 
 #include "quo_base/acquisition.h"
 #include "quo_base/generalSAR_configuration.h"
+#include "stopwatch.h"
 #include "transform.h"
 
 namespace example {
@@ -26,11 +27,10 @@ public:
     /** Range time of the first compressed sample after that of the first raw sample, s. */
     [[nodiscard]] double delay_s() const { return delay_s_; }
 
-    void transform() { forward_.run(block_); }
-    void filter();
-    void transform_back() { inverse_.run(block_); }
+    void compress(Stopwatch& watch);
 
 private:
+    void filter();
     void prepare_filter(const std::vector<fcomplex>& replica, const SARPulse_Obj& pulse, const AzimuthConf& conf);
 
     int samples_;

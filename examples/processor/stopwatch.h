@@ -8,8 +8,9 @@
 namespace example {
 
 /** What the processor's time goes into. */
-enum class Work : std::size_t { kPlanning, kReading, kWriting, kTransforms, kFilters };
-inline constexpr std::size_t kWorks = 5;
+enum Work : std::size_t { kPlanning, kReading, kWriting, kTransforms, kFilters, kWorks };
+inline constexpr std::array<const char*, kWorks> kWorkNames{"planning transforms", "reading", "writing",
+                                                            "transforms", "filters"};
 
 /** Adds up the time that each kind of work takes. */
 class Stopwatch {
@@ -18,9 +19,9 @@ public:
     void time(Work work, Piece&& piece) {
         const auto start = Clock::now();
         piece();
-        seconds_[static_cast<std::size_t>(work)] += since(start);
+        seconds_[work] += since(start);
     }
-    [[nodiscard]] double seconds(Work work) const { return seconds_[static_cast<std::size_t>(work)]; }
+    [[nodiscard]] double seconds(std::size_t work) const { return seconds_[work]; }
     /** Since the object was made. */
     [[nodiscard]] double total() const { return since(start_); }
 

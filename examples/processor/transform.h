@@ -17,7 +17,7 @@ public:
           samples_{samples},
           data_{static_cast<fcomplex*>(
               fft_calloc(static_cast<std::size_t>(lines) * static_cast<std::size_t>(samples), sizeof(fcomplex)))} {
-        if (!data_) throw Failure{"no memory for a block", QUO_NO_MEMORY};
+        if (!data_) throw Failure{"no memory for a block"};
     }
     [[nodiscard]] int lines() const { return lines_; }
     [[nodiscard]] int samples() const { return samples_; }
