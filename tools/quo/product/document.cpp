@@ -54,6 +54,14 @@ bool Document::in(const std::string& file) {
     return document.parse() == QUO_OK && document.isRecognized();
 }
 
+void require_document(const std::string& file, bool may_be_missing) {
+    std::error_code error;
+    if (may_be_missing && std::filesystem::status(file, error).type() == std::filesystem::file_type::not_found)
+        return;
+    forget_system_error();
+    if (!Document::in(file)) refuse_header(file, QUO_REFUSED, "is no header document");
+}
+
 std::vector<std::string> Document::values(const std::string& field) {
     const std::string path = is_array(field) ? field + "/val" : field;
     std::vector<std::string> texts;

@@ -51,6 +51,10 @@ private:
     std::string file_;
 };
 
+/** Throws Failure unless the file is a header document, or, where `may_be_missing`, is not there: writing a
+ * section would put a fresh document in the place of anything else. */
+void require_document(const std::string& file, bool may_be_missing);
+
 }  // namespace tool
 
 #endif

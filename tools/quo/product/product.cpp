@@ -66,6 +66,12 @@ std::vector<Corner> grid_corners(const GeneralSAR& product) {
     return corners;
 }
 
+void read_region(const std::string& header, ROI_Obj& region) {
+    const bool found = region.read_roi(header.c_str(), "ROI") == QUO_OK && region.isNULL() == 0;
+    const double sum = region.FastStartTime + region.FastTimeLength + region.SlowStartTime + region.SlowTimeLength;
+    if (!found || !std::isfinite(sum)) throw Failure(header + ": no region (section ROI)");
+}
+
 double last_line_time(const ROI_Obj& region) {
     return region.SlowStartTime + region.SlowTimeDelta * (region.Lines - 1);
 }

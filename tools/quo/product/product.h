@@ -22,6 +22,9 @@ const parElement* element_at(GeneralSAR& product, std::string_view field);
 /** Whether a field is known to hold numbers. */
 bool is_numeric_field(GeneralSAR& product, std::string_view field);
 
+/** Reads a header's section ROI. Throws Failure where it is not there or holds no sample. */
+void read_region(const std::string& header, ROI_Obj& region);
+
 /** Azimuth time of a region's last line, s since 1985. */
 double last_line_time(const ROI_Obj& region);
 

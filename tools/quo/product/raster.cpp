@@ -270,7 +270,9 @@ template void NewRaster::write(const Tile&, const fcomplex*);
 template void NewRaster::write(const Tile&, const dcomplex*);
 
 void NewRaster::commit() {
+    throw_if_interrupted();
     if (file_.commit() != QUO_OK) fail();
+    say_losses();
 }
 
 void NewRaster::say_losses() const {

@@ -102,15 +102,16 @@ public:
     void write(const Tile& tile, const T* from);
     /** Writes bytes from `offset` on. Throws Failure. */
     void write_bytes(std::int64_t offset, const char* from, std::int64_t bytes);
-    /** The raster is complete: it and its side file, in which other sections stay, take their names together. */
+    /** The raster is complete: it and its side file, in which other sections stay, take their names together. Says
+     * on standard error how many of the samples written could not be kept, if any. Throws Failure, and
+     * Interrupted. */
     void commit();
     /** No value written from now on is beyond the type: looking for one would cost a third of a copy's time. */
     void expect_no_losses() { counts_losses_ = false; }
-    /** Says on standard error how many of the samples written could not be kept, if any. */
-    void say_losses() const;
 
 private:
     [[noreturn]] void fail() const;
+    void say_losses() const;
 
     std::string name_;
     BufferFile file_;

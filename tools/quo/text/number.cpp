@@ -44,17 +44,27 @@ std::string fixed(double value, int decimals) {
 std::string rough(double value) { return with_digits(value, 3); }
 std::string handy(double value) { return with_digits(value, 10); }
 
-std::optional<double> finite_number(std::string_view text) {
+std::string_view trimmed(std::string_view text) {
     constexpr std::string_view kBlanks = " \t";
     const std::size_t first = text.find_first_not_of(kBlanks);
-    if (first == std::string_view::npos) return std::nullopt;
-    text = text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
+    return first == text.npos ? "" : text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
+}
+
+std::optional<double> finite_number(std::string_view text) {
+    text = trimmed(text);
     if (text.size() > 1 && text[0] == '+' && text[1] != '-') text.remove_prefix(1);
 
     double value = 0.0;
     const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
     if (error != std::errc{} || end != text.data() + text.size() || !std::isfinite(value)) return std::nullopt;
     return value;
+}
+
+std::optional<std::pair<double, double>> number_pair(std::string_view text, char separator) {
+    const auto middle = text.find(separator);
+    if (middle == text.npos) return std::nullopt;
+    const auto first = finite_number(text.substr(0, middle)), second = finite_number(text.substr(middle + 1));
+    return first && second ? std::optional{std::pair{*first, *second}} : std::nullopt;
 }
 
 }  // namespace tool

@@ -4,6 +4,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
 
 namespace tool {
 
@@ -22,9 +23,15 @@ std::string rough(double value);
 /** The value with ten significant digits, for people who compare. */
 std::string handy(double value);
 
+/** The text without the blanks and tabs around it. */
+std::string_view trimmed(std::string_view text);
+
 /** The number that the whole text is, blanks around it and a leading plus sign allowed. Nothing for anything else,
  * and for infinity and not-a-number, which no computation here can use. */
 std::optional<double> finite_number(std::string_view text);
+
+/** The two numbers of a text such as "4x1", with a separator in between; nothing for anything else. */
+std::optional<std::pair<double, double>> number_pair(std::string_view text, char separator);
 
 }  // namespace tool
 

@@ -42,10 +42,9 @@ void add_waitbar_option(CLI::App& command, bool& waitbar) {
     command.add_flag("--waitbar", waitbar, "Tell the progress on standard error, as commands of a waitbar");
 }
 
-Progress::Progress(Unit unit, const char* waitbar_title)
+Progress::Progress(const char* waitbar_title)
     : waitbar_{waitbar_title != nullptr},
       terminal_{!waitbar_ && isatty(STDERR_FILENO) == 1},
-      unit_{unit},
       start_{Clock::now()},
       next_{start_ + std::chrono::milliseconds{500}} {
     if (waitbar_) waitbar_open(waitbar_title);
@@ -70,9 +69,9 @@ void Progress::step(std::int64_t done, std::int64_t in_all) {
     if (!terminal_ || now < next_ || share <= 0.0) return;
     next_ = now + std::chrono::milliseconds{100};
     const double elapsed_s = std::chrono::duration<double>(now - start_).count();
-    std::string text = bar(share);
-    if (unit_ == Unit::kBytes) text += "  " + fixed(static_cast<double>(done) / elapsed_s / 1e6, 0) + " MB/s";
-    draw(text + "  " + clock_text(elapsed_s * (1.0 - share) / share) + " left");
+    const double speed = static_cast<double>(done) / elapsed_s / 1e6;
+    draw(bar(share) + "  " + fixed(speed, 0) + " MB/s  " + clock_text(elapsed_s * (1.0 - share) / share) +
+         " left");
 }
 
 void Progress::tell(double share) {

@@ -19,11 +19,8 @@ void add_waitbar_option(CLI::App& command, bool& waitbar);
  * the parent process instead, whom it tells the share that is done, line by line (quo_base/debugIO.h). */
 class Progress {
 public:
-    /** What is counted. */
-    enum class Unit { kRows, kBytes };
-
     /** @param waitbar_title  null: no waitbar */
-    explicit Progress(Unit unit = Unit::kRows, const char* waitbar_title = nullptr);
+    explicit Progress(const char* waitbar_title);
     ~Progress();
     Progress(const Progress&) = delete;
     Progress& operator=(const Progress&) = delete;
@@ -43,7 +40,6 @@ private:
 
     bool waitbar_, terminal_;
     double told_ = -1.0;
-    Unit unit_;
     bool visible_ = false;
     unsigned calls_ = 0;
     Clock::time_point start_, next_;

@@ -1,35 +1,15 @@
 #include "shown.h"
 
+#include <algorithm>
 #include <cstdint>
 #include <nlohmann/json.hpp>
 
+#include "number.h"
 #include "output.h"
+#include "sarutillib/ground/utf8.h"
 
 namespace tool {
 namespace {
-
-/** A character at the start of a text; 0 bytes where none is whole there. */
-struct Character {
-    std::uint32_t code;
-    std::size_t bytes;
-};
-
-Character first_of(std::string_view text) {
-    const auto byte = [text](std::size_t i) { return static_cast<unsigned char>(text[i]); };
-    const unsigned char lead = byte(0);
-    if (lead < 0x80) return {lead, 1};
-    const std::size_t bytes = lead >= 0xF0 ? 4 : lead >= 0xE0 ? 3 : 2;
-    constexpr std::uint32_t kLeast[] = {0, 0, 0x80, 0x800, 0x10000};  // shorter forms are no UTF-8
-    if (lead < 0xC2 || lead > 0xF4 || text.size() < bytes) return {lead, 0};
-    std::uint32_t code = lead & (0x7FU >> bytes);
-    for (std::size_t i = 1; i < bytes; ++i) {
-        if ((byte(i) & 0xC0U) != 0x80U) return {lead, 0};
-        code = code << 6U | (byte(i) & 0x3FU);
-    }
-    const bool surrogate = code >= 0xD800 && code <= 0xDFFF;
-    if (code < kLeast[bytes] || code > 0x10FFFF || surrogate) return {lead, 0};
-    return {code, bytes};
-}
 
 /** Whether a terminal would obey the character instead of showing it. */
 bool is_command(std::uint32_t code) {
@@ -60,15 +40,15 @@ std::string shown_except(std::string_view text, std::string_view kept) {
     std::string line;
     line.reserve(text.size());
     while (!text.empty()) {
-        const Character character = first_of(text);
-        if (character.bytes == 0) {
-            line += "\\x" + hexadecimal(character.code, 2);
-        } else if (is_command(character.code) && kept.find(text[0]) == std::string_view::npos) {
-            line += escaped(character.code);
+        const auto [code, length] = quo::first_utf8(text);
+        if (length == 0) {
+            line += "\\x" + hexadecimal(static_cast<unsigned char>(text[0]), 2);
+        } else if (is_command(code) && kept.find(text[0]) == std::string_view::npos) {
+            line += escaped(code);
         } else {
-            line += text.substr(0, character.bytes);
+            line += text.substr(0, length);
         }
-        text.remove_prefix(character.bytes == 0 ? 1 : character.bytes);
+        text.remove_prefix(std::max<std::size_t>(length, 1));
     }
     return line;
 }
@@ -85,6 +65,15 @@ std::string column(std::string text, std::size_t width) {
 }
 
 void print(std::string_view lines) { write_output("-", shown_lines(lines)); }
+
+std::string text_of(const nlohmann::ordered_json& value) {
+    if (value.is_string()) return shown(value.get<std::string>());
+    if (value.is_number_float()) return exact(value.get<double>());
+    if (!value.is_array()) return value.dump();
+    std::string text;
+    for (const auto& part : value) (text += text.empty() ? "" : " ") += text_of(part);
+    return text;
+}
 
 void print_json(const nlohmann::ordered_json& json, int indent) {
     print(json.dump(indent, ' ', false, nlohmann::ordered_json::error_handler_t::replace) + "\n");

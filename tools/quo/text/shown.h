@@ -21,6 +21,9 @@ std::string column(std::string text, std::size_t width);
 
 /** Writes lines to standard output, shown. Throws Failure where they do not arrive. */
 void print(std::string_view lines);
+/** A value as people see it: texts shown, numbers exact, the parts of a list with blanks in between. */
+std::string text_of(const nlohmann::ordered_json& value);
+
 /** Writes JSON, indented by `indent` (-1: on one line). What is escaped reads back as the same text. */
 void print_json(const nlohmann::ordered_json& json, int indent = 2);
 

@@ -3,16 +3,10 @@
 #include <algorithm>
 
 #include "failure.h"
+#include "number.h"
 
 namespace tool {
 namespace {
-
-std::string_view trimmed(std::string_view text) {
-    constexpr std::string_view kBlanks = " \t";
-    const std::size_t first = text.find_first_not_of(kBlanks);
-    if (first == std::string_view::npos) return {};
-    return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
-}
 
 /** A field without the quotes around it. Quotes inside stay as they are: no column that is looked for has any. */
 std::string_view unquoted(std::string_view field) {
@@ -88,6 +82,19 @@ std::optional<std::string> Table::defect() const {
     if (fields_.size() != columns_.size())
         return std::to_string(fields_.size()) + " values for " + std::to_string(columns_.size()) + " columns";
     return std::nullopt;
+}
+
+std::vector<double> Table::numbers(std::span<const std::size_t> columns) const {
+    if (const auto wrong = defect()) throw Failure(place() + ": " + *wrong);
+    std::vector<double> values;
+    for (const std::size_t column : columns) {
+        const auto number = finite_number(fields_[column]);
+        if (!number)
+            throw Failure(place() + ": " + columns_[column] + " is \"" + std::string{fields_[column]} +
+                          "\", not a number");
+        values.push_back(*number);
+    }
+    return values;
 }
 
 std::string Table::place() const { return input_.name() + ": line " + std::to_string(input_.line_number()); }

@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <optional>
+#include <span>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -42,6 +43,8 @@ public:
     bool well_quoted() const { return well_quoted_; }
     /** What is wrong with the row's shape, or nothing. */
     std::optional<std::string> defect() const;
+    /** The row's numbers in some columns; throws Failure for a row with a defect, or that lacks one of them. */
+    std::vector<double> numbers(std::span<const std::size_t> columns) const;
     /** "file: line 17", for messages about the row. */
     std::string place() const;
 

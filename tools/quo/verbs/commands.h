@@ -4,6 +4,14 @@
 #include <CLI/CLI.hpp>
 #include <functional>
 #include <memory>
+#include <string>
+#include <string_view>
+#include <vector>
+
+// What every verb says, and how.
+#include "failure.h"
+#include "number.h"
+#include "shown.h"
 
 namespace tool {
 

@@ -3,20 +3,13 @@
 #include <filesystem>
 #include <fstream>
 #include <iterator>
-#include <memory>
 #include <nlohmann/json.hpp>
-#include <string>
-#include <string_view>
-#include <vector>
 
 #include "commands.h"
 #include "document.h"
-#include "failure.h"
 #include "field_check.h"
-#include "number.h"
 #include "output.h"
 #include "quo_base/generalSAR_configuration.h"
-#include "shown.h"
 
 namespace tool {
 namespace {
@@ -67,15 +60,6 @@ Json values_of(const parElement& element) {
     Json values = Json::array();
     for (int i = 0; i < element.count; ++i) values.push_back(value_at(element, i));
     return values;
-}
-
-std::string text_of(const Json& value) {
-    if (value.is_string()) return shown(value.get<std::string>());
-    if (value.is_number_float()) return exact(value.get<double>());
-    if (!value.is_array()) return value.dump();
-    std::string text;
-    for (const Json& part : value) text += (text.empty() ? "" : " ") + text_of(part);
-    return text;
 }
 
 // --- doc --------------------------------------------------------------------------------------------------------

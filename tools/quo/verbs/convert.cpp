@@ -1,13 +1,10 @@
 #include <algorithm>
 #include <complex>
 #include <type_traits>
-#include <vector>
 
 #include "apart.h"
 #include "commands.h"
-#include "failure.h"
 #include "interrupt.h"
-#include "number.h"
 #include "progress.h"
 #include "raster.h"
 
@@ -75,25 +72,20 @@ public:
     }
 
     void run(bool waitbar) {
-        copy_all(waitbar);
-        throw_if_interrupted();
+        {
+            Progress progress{waitbar ? "Converting" : nullptr};
+            for_each_tile(lines_.count(), samples_.count(), 1, [&](const Tile& tile) {
+                throw_if_interrupted();
+                copy(tile);
+                progress.step(
+                    sample_offset(wanted_, tile.first_line + tile.lines - 1, tile.first_sample + tile.samples),
+                    wanted_.rasterSize());
+            });
+        }
         out_.commit();
-        out_.say_losses();
     }
 
 private:
-    void copy_all(bool waitbar) {
-        Progress progress{Progress::Unit::kBytes, waitbar ? "Converting" : nullptr};
-        const std::int64_t in_all = wanted_.rasterSize();
-        for_each_tile(lines_.count(), samples_.count(), 1, [&](const Tile& tile) {
-            throw_if_interrupted();
-            copy(tile);
-            progress.step(
-                sample_offset(wanted_, tile.first_line + tile.lines - 1, tile.first_sample + tile.samples),
-                in_all);
-        });
-    }
-
     void copy(const Tile& tile) {
         if (tile.first_sample == 0) {
             for (int line = 0; line < tile.lines; ++line) copy_prefix(tile.first_line + line);

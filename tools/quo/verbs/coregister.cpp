@@ -1,17 +1,14 @@
 #include <array>
 #include <cmath>
 #include <nlohmann/json.hpp>
-#include <vector>
 
 #include "commands.h"
-#include "failure.h"
-#include "number.h"
+#include "document.h"
+#include "product.h"
 #include "quo_base/Coregist.h"
 #include "quo_base/MatrixAlgebraANSI.h"
-#include "region.h"
 #include "residuals.h"
 #include "scene.h"
-#include "shown.h"
 
 namespace tool {
 namespace {
@@ -123,33 +120,30 @@ std::array<Row, 4> rows_of(const Agreement& agreement) {
              {"slave to master", "azimuth", "lines", agreement.back_lines}}};
 }
 
-std::string as_text(const Agreement& agreement) {
+void print_agreement(const Agreement& agreement, const Coregist& mapping, bool json) {
+    auto residuals = nlohmann::ordered_json::array();
     std::string text = "# points " + std::to_string(agreement.range_samples.count()) +
                        "\ndirection,axis,unit,largest_residual,rms_residual\n";
-    for (const Row& row : rows_of(agreement))
-        text += std::string{row.direction} + "," + row.axis + "," + row.unit + "," +
-                rough(row.residuals.largest()) + "," + rough(row.residuals.rms()) + "\n";
-    return text;
-}
-
-nlohmann::ordered_json as_json(const Agreement& agreement, const Coregist& mapping) {
-    auto residuals = nlohmann::ordered_json::array();
-    for (const Row& row : rows_of(agreement))
-        residuals.push_back({{"direction", row.direction},
-                             {"axis", row.axis},
-                             {"unit", row.unit},
-                             {"largest", row.residuals.largest()},
-                             {"rms", row.residuals.rms()}});
-    return {{"points", agreement.range_samples.count()},
-            {"residuals", residuals},
-            {"trg0_s", mapping.trg0},
-            {"taz0_s", mapping.taz0},
-            {"RgFit", mapping.RgFit},
-            {"AzFit", mapping.AzFit},
-            {"Rg_Fit_Coeff", mapping.Rg_Fit_Coeff},
-            {"Az_Fit_Coeff", mapping.Az_Fit_Coeff},
-            {"Rg_Samples_Origin", mapping.Rg_Samples_Origin},
-            {"Az_Samples_Origin", mapping.Az_Samples_Origin}};
+    for (const auto& [direction, axis, unit, residual] : rows_of(agreement)) {
+        text += std::string{direction} + "," + axis + "," + unit + "," + rough(residual.largest()) + "," +
+                rough(residual.rms()) + "\n";
+        residuals.push_back({{"direction", direction},
+                             {"axis", axis},
+                             {"unit", unit},
+                             {"largest", residual.largest()},
+                             {"rms", residual.rms()}});
+    }
+    if (!json) return print(text);
+    print_json({{"points", agreement.range_samples.count()},
+                {"residuals", residuals},
+                {"trg0_s", mapping.trg0},
+                {"taz0_s", mapping.taz0},
+                {"RgFit", mapping.RgFit},
+                {"AzFit", mapping.AzFit},
+                {"Rg_Fit_Coeff", mapping.Rg_Fit_Coeff},
+                {"Az_Fit_Coeff", mapping.Az_Fit_Coeff},
+                {"Rg_Samples_Origin", mapping.Rg_Samples_Origin},
+                {"Az_Samples_Origin", mapping.Az_Samples_Origin}});
 }
 
 void write_mapping(const std::string& file, Coregist& mapping) {
@@ -176,7 +170,7 @@ int coregister(const CoregisterOptions& options) {
         throw Failure("no sample form, status " + status_text(status));
     const Agreement agreement = judge(matches, mapping, master, slave);
     write_mapping(options.output, mapping);
-    options.json ? print_json(as_json(agreement, mapping)) : print(as_text(agreement));
+    print_agreement(agreement, mapping, options.json);
     return kFine;
 }
 

@@ -6,14 +6,9 @@
 #include <filesystem>
 #include <fstream>
 #include <nlohmann/json.hpp>
-#include <string>
-#include <vector>
 
 #include "commands.h"
-#include "failure.h"
-#include "number.h"
 #include "quo_base/debugIO.h"
-#include "shown.h"
 
 namespace tool {
 namespace {
@@ -53,11 +48,6 @@ Json value_of(int type, const char* bytes) {
         default:
             return taken<std::int8_t>(bytes);
     }
-}
-
-std::string text_of(const Json& value) {
-    if (value.is_array()) return text_of(value[0]) + " " + text_of(value[1]);
-    return value.is_number_float() ? exact(value.get<double>()) : value.dump();
 }
 
 /** A dump: its header words, compared with the file's length before anything is taken from it. */
@@ -116,7 +106,7 @@ private:
     std::int32_t type_ = 0, first_ = 0, second_ = 0;
 };
 
-std::string text_of(const Dump& dump, const std::vector<Json>& values) {
+std::string as_text(const Dump& dump, const std::vector<Json>& values) {
     std::string text =
         "type code           " + std::to_string(dump.type()) + ", " + std::to_string(dump.element_bytes()) +
         " bytes, shown as " + kTypes[static_cast<std::size_t>(dump.type())] + "\nfirst dimension     " +
@@ -129,7 +119,7 @@ std::string text_of(const Dump& dump, const std::vector<Json>& values) {
     return text;
 }
 
-Json json_of(const Dump& dump, const std::vector<Json>& values) {
+Json as_json(const Dump& dump, const std::vector<Json>& values) {
     return Json{{"type_code", dump.type()},
                 {"element_bytes", dump.element_bytes()},
                 {"shown_as", kTypes[static_cast<std::size_t>(dump.type())]},
@@ -142,7 +132,7 @@ int show_dump(const DumpOptions& options) {
     if (options.values < 0) throw WrongUse("--values " + std::to_string(options.values));
     Dump dump{options.file};
     const std::vector<Json> values = dump.read(options.values);
-    options.json ? print_json(json_of(dump, values)) : print(text_of(dump, values));
+    options.json ? print_json(as_json(dump, values)) : print(as_text(dump, values));
     const std::string defect = dump.defect();
     if (defect.empty()) return kFine;
     complain(options.file + ": " + defect);

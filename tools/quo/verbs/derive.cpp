@@ -1,20 +1,16 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
-#include <memory>
 #include <nlohmann/json.hpp>
 #include <optional>
-#include <vector>
 
 #include "commands.h"
-#include "failure.h"
-#include "number.h"
+#include "document.h"
+#include "product.h"
 #include "quo_base/SARpolynomials.h"
 #include "quo_base/quorelxml_v2.h"
-#include "region.h"
 #include "residuals.h"
 #include "scene.h"
-#include "shown.h"
 
 namespace tool {
 namespace {
@@ -199,37 +195,33 @@ void store(const std::string& header, const Result& result, polySAR& set) {
     require_done(header, "cannot be written", [&] { return set.writehdr(header.c_str()); });
 }
 
-std::string as_text(const Result& result) {
-    std::string kept;
+void print_result(const Result& result, bool json) {
+    std::string kept_text;
     std::string text = "quantity,unit,largest_residual,rms_residual,trg0_s,taz0_s,c0,c1,c2,c3,c4,c5,c6\n";
-    for (std::size_t q = 0; q < kQuantities; ++q) {
-        if (result.kept[q]) kept += std::string{"# kept "} + kAbouts[q].name + "\n";
-        if (!result.wanted[q]) continue;
-        const poly& p = result.polynomials[static_cast<Quantity>(q)];
-        text += std::string{kAbouts[q].name} + "," + kAbouts[q].unit + "," + rough(result.residuals[q].largest()) +
-                "," + rough(result.residuals[q].rms()) + "," + exact(p.trg0) + "," + exact(p.taz0);
-        for (const double c : p.pol) text += "," + exact(c);
-        text += "\n";
-    }
-    return kept + text;
-}
-
-nlohmann::ordered_json as_json(const Result& result) {
     auto derived = nlohmann::ordered_json::array();
     auto kept = nlohmann::ordered_json::array();
     for (std::size_t q = 0; q < kQuantities; ++q) {
-        if (result.kept[q]) kept.push_back(kAbouts[q].name);
+        const auto& [group, name, unit] = kAbouts[q];
+        if (result.kept[q]) {
+            kept_text += std::string{"# kept "} + name + "\n";
+            kept.push_back(name);
+        }
         if (!result.wanted[q]) continue;
         const poly& p = result.polynomials[static_cast<Quantity>(q)];
-        derived.push_back({{"quantity", kAbouts[q].name},
-                           {"unit", kAbouts[q].unit},
-                           {"largest_residual", result.residuals[q].largest()},
-                           {"rms_residual", result.residuals[q].rms()},
+        const double largest = result.residuals[q].largest(), rms = result.residuals[q].rms();
+        text += std::string{name} + "," + unit + "," + rough(largest) + "," + rough(rms) + "," + exact(p.trg0) +
+                "," + exact(p.taz0);
+        for (const double c : p.pol) text += "," + exact(c);
+        text += "\n";
+        derived.push_back({{"quantity", name},
+                           {"unit", unit},
+                           {"largest_residual", largest},
+                           {"rms_residual", rms},
                            {"trg0_s", p.trg0},
                            {"taz0_s", p.taz0},
                            {"pol", p.pol}});
     }
-    return {{"derived", derived}, {"kept", kept}};
+    json ? print_json({{"derived", derived}, {"kept", kept}}) : print(kept_text + text);
 }
 
 int derive(const DeriveOptions& options) {
@@ -254,7 +246,7 @@ int derive(const DeriveOptions& options) {
         throw Failure(options.header + ": the region cannot be derived from, status " + status_text(status));
     const bool anything = std::find(result.wanted.begin(), result.wanted.end(), true) != result.wanted.end();
     if (anything) store(options.header, result, set);
-    options.json ? print_json(as_json(result)) : print(as_text(result));
+    print_result(result, options.json);
     return kFine;
 }
 

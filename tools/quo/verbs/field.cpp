@@ -2,19 +2,13 @@
 #include <cstdint>
 #include <nlohmann/json.hpp>
 #include <optional>
-#include <string>
-#include <string_view>
 #include <utility>
-#include <vector>
 
 #include "commands.h"
 #include "document.h"
-#include "failure.h"
 #include "field_check.h"
-#include "number.h"
 #include "output.h"
 #include "product.h"
-#include "shown.h"
 
 namespace tool {
 namespace {

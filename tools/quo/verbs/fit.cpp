@@ -2,15 +2,11 @@
 #include <cmath>
 #include <limits>
 #include <nlohmann/json.hpp>
-#include <vector>
 
 #include "commands.h"
-#include "failure.h"
-#include "number.h"
 #include "quo_base/MatrixAlgebraANSI.h"
 #include "quo_base/api.h"
 #include "residuals.h"
-#include "shown.h"
 #include "table.h"
 
 namespace tool {
@@ -30,24 +26,17 @@ struct Points {
     std::string x_name, y_name;
 };
 
-double number_in(const Table& table, std::size_t column) {
-    const std::string_view text = table.fields()[column];
-    if (const auto number = finite_number(text)) return *number;
-    throw Failure(table.place() + ": " + table.columns()[column] + " is \"" + std::string{text} +
-                  "\", not a number");
-}
-
 Points read_points(const FitOptions& options) {
     Table table{options.input};
     if (table.columns().size() < 2) throw Failure(table.input().name() + ": needs two columns");
-    const std::size_t x = options.x.empty() ? 0 : table.need(options.x);
-    const std::size_t y = options.y.empty() ? 1 : table.need(options.y);
-    Points points{.x = {}, .y = {}, .x_name = table.columns()[x], .y_name = table.columns()[y]};
+    const std::size_t xy[] = {options.x.empty() ? 0 : table.need(options.x),
+                              options.y.empty() ? 1 : table.need(options.y)};
+    Points points{.x = {}, .y = {}, .x_name = table.columns()[xy[0]], .y_name = table.columns()[xy[1]]};
     while (table.next()) {
-        if (const auto defect = table.defect()) throw Failure(table.place() + ": " + *defect);
+        const std::vector<double> numbers = table.numbers(xy);
         if (points.x.size() == kMostPoints) throw Failure(table.place() + ": more than ten million points");
-        points.x.push_back(number_in(table, x));
-        points.y.push_back(number_in(table, y));
+        points.x.push_back(numbers[0]);
+        points.y.push_back(numbers[1]);
     }
     return points;
 }

@@ -1,13 +1,10 @@
 #include <algorithm>
 #include <cmath>
 #include <nlohmann/json.hpp>
-#include <vector>
 
 #include "commands.h"
-#include "failure.h"
 #include "product.h"
 #include "scene.h"
-#include "shown.h"
 
 namespace tool {
 namespace {

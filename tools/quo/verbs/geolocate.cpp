@@ -6,9 +6,7 @@
 
 #include "apart.h"
 #include "commands.h"
-#include "failure.h"
 #include "interrupt.h"
-#include "number.h"
 #include "output.h"
 #include "progress.h"
 #include "scene.h"
@@ -148,21 +146,6 @@ void append_row(std::string& line, const Table& table) {
     }
 }
 
-/** Messages about single rows: the first few in full, all of them counted. */
-class RowMessages {
-public:
-    void add(Progress& progress, const std::string& message) {
-        constexpr std::int64_t kShown = 10;
-        if (++count_ > kShown) return;
-        progress.wipe();
-        complain(message);
-    }
-    std::int64_t count() const { return count_; }
-
-private:
-    std::int64_t count_ = 0;
-};
-
 /** Solves one row and writes it. Returns nothing, or why there is no solution. */
 std::optional<std::string> geolocate_row(Scene& scene, const Table& table, const Direction& direction,
                                          const Columns& columns, std::string& line) {
@@ -198,22 +181,25 @@ int geolocate_table(Scene& scene, const GeolocateOptions& options, const Directi
 
     Output output{options.output};
     output.write(heading(table, direction));
-    RowMessages messages;
-    std::int64_t rows = 0;
+    constexpr std::int64_t kShown = 10;  // messages about single rows; all of them are counted
+    std::int64_t rows = 0, unsolved = 0;
     {
-        Progress progress{Progress::Unit::kRows, options.waitbar ? "Geolocating" : nullptr};
+        Progress progress{options.waitbar ? "Geolocating" : nullptr};
         std::string line;
         while (table.next()) {
             line.clear();
-            if (const auto cause = geolocate_row(scene, table, direction, columns, line))
-                messages.add(progress, table.place() + ": " + *cause);
+            const auto cause = geolocate_row(scene, table, direction, columns, line);
+            if (cause && ++unsolved <= kShown) {
+                progress.wipe();
+                complain(table.place() + ": " + *cause);
+            }
             output.write(line);
             progress.show(table.input().bytes_read(), table.input().bytes_in_all(), ++rows);
         }
     }
     output.commit();
-    if (messages.count() == 0) return kFine;
-    complain(table.input().name() + ": " + std::to_string(messages.count()) + " of " + std::to_string(rows) +
+    if (unsolved == 0) return kFine;
+    complain(table.input().name() + ": " + std::to_string(unsolved) + " of " + std::to_string(rows) +
              " rows without a solution");
     return kFindings;
 }

@@ -1,75 +1,43 @@
-#include <nlohmann/json.hpp>
-#include <string_view>
-#include <vector>
-
 #include "commands.h"
 #include "date.h"
-#include "failure.h"
-#include "number.h"
+#include "facts.h"
 #include "product.h"
 #include "raster.h"
-#include "shown.h"
 
 namespace tool {
 namespace {
 
-/** What is known of a product, in the order in which it is shown: to people with rounded numbers and handy units,
- * as JSON exactly. */
-class Facts {
-public:
-    void add(const char* name, const char* key, const std::string& text, nlohmann::ordered_json value) {
-        rows_.push_back({name, shown(text)});
-        json_[key] = std::move(value);
-    }
-    void add_text(const char* name, const char* key, const std::string& text) { add(name, key, text, text); }
-    /** A text that is not the mark of a missing one. */
-    void add_known(const char* name, const char* key, std::string_view text, std::string_view unknown) {
-        if (!text.empty() && text != unknown && text != "NOT_AVAILABLE") add_text(name, key, std::string{text});
-    }
-    /** A number that is not the mark of a missing one; people see `scale` times it in `unit`. */
-    void add_number(const char* name, const char* key, double value, double scale, const char* unit) {
-        if (value > kUnknown) add(name, key, handy(value * scale) + " " + unit, value);
-    }
-    void add_time(const char* name, const char* key, double seconds) {
-        const std::string date = date_text(seconds).value_or("-");
-        add(name, key, date + "  (" + exact(seconds) + " s)", {{"seconds", seconds}, {"date", date}});
-    }
-
-    [[nodiscard]] std::string text() const {
-        constexpr std::size_t kColumn = 20;
-        std::string text;
-        for (const auto& [name, value] : rows_) text += column(name, kColumn) + value + "\n";
-        return text;
-    }
-    [[nodiscard]] const nlohmann::ordered_json& json() const { return json_; }
-
-private:
-    static constexpr double kUnknown = -900.0;
-
-    struct Row {
-        std::string name, value;
-    };
-    std::vector<Row> rows_;
-    nlohmann::ordered_json json_;
-};
+/** A text that is not the mark of a missing one. */
+void add_known(Facts& facts, const char* name, const char* key, std::string_view text, std::string_view unknown) {
+    if (!text.empty() && text != unknown && text != "NOT_AVAILABLE") facts.add_text(name, key, std::string{text});
+}
+/** A number that is not the mark of a missing one; people see `scale` times it in `unit`. */
+void add_number(Facts& facts, const char* name, const char* key, double value, double scale, const char* unit) {
+    constexpr double kUnknown = -900.0;
+    if (value > kUnknown) facts.add(name, key, handy(value * scale) + " " + unit, value);
+}
+void add_time(Facts& facts, const char* name, const char* key, double seconds) {
+    const std::string date = date_text(seconds).value_or("-");
+    facts.add(name, key, date + "  (" + exact(seconds) + " s)", {{"seconds", seconds}, {"date", date}});
+}
 
 void add_data_set(Facts& facts, const DataSetInfo_Obj& info) {
-    facts.add_known("mission", "mission", info.SensorName, "SENSOR UNKNOWN");
-    facts.add_known("mode", "mode", info.AcquisitionMode, "ACQUISITION MODE UNDEFINED");
-    facts.add_known("polarization", "polarization", info.Polarization, "");
-    facts.add_known("swath", "swath", info.Swath, "");
-    facts.add_known("scene", "scene", info.SceneID, "");
-    facts.add_known("description", "description", info.Description, "");
-    facts.add_known("image type", "image_type", info.ImageType, "NOT SET");
-    facts.add_known("projection", "projection", info.Projection, "PROJECTION UNDEFINED");
+    add_known(facts, "mission", "mission", info.SensorName, "SENSOR UNKNOWN");
+    add_known(facts, "mode", "mode", info.AcquisitionMode, "ACQUISITION MODE UNDEFINED");
+    add_known(facts, "polarization", "polarization", info.Polarization, "");
+    add_known(facts, "swath", "swath", info.Swath, "");
+    add_known(facts, "scene", "scene", info.SceneID, "");
+    add_known(facts, "description", "description", info.Description, "");
+    add_known(facts, "image type", "image_type", info.ImageType, "NOT SET");
+    add_known(facts, "projection", "projection", info.Projection, "PROJECTION UNDEFINED");
     facts.add_text("look side", "look_side", info.LookDirection < 0 ? "left" : "right");
 }
 
 void add_region(Facts& facts, const ROI_Obj& region) {
     if (region.isNULL() != 0) return;
-    facts.add_time("first line", "first_line", region.SlowStartTime);
-    facts.add_time("last line", "last_line", last_line_time(region));
-    facts.add_number("span", "span_s", region.SlowTimeLength, 1.0, "s");
+    add_time(facts, "first line", "first_line", region.SlowStartTime);
+    add_time(facts, "last line", "last_line", last_line_time(region));
+    add_number(facts, "span", "span_s", region.SlowTimeLength, 1.0, "s");
     facts.add("region", "region",
               std::to_string(region.Lines) + " lines x " + std::to_string(region.Samples) + " samples",
               {{"lines", region.Lines}, {"samples", region.Samples}});
@@ -98,12 +66,12 @@ void add_raster(Facts& facts, const RasterDescription& raster) {
 }
 
 void add_sampling(Facts& facts, const SamplingConstants_Obj& sampling) {
-    facts.add_number("PRF", "prf_hz", sampling.prf_hz, 1.0, "Hz");
-    facts.add_number("sampling rate", "sampling_rate_hz", sampling.frg_hz, 1e-6, "MHz");
-    facts.add_number("carrier", "carrier_hz", sampling.fc_hz, 1e-9, "GHz");
-    facts.add_number("wavelength", "wavelength_m", sampling.lambda_m, 1.0, "m");
-    facts.add_number("range bandwidth", "range_bandwidth_hz", sampling.Brg_hz, 1e-6, "MHz");
-    facts.add_number("azimuth bandwidth", "azimuth_bandwidth_hz", sampling.Baz_hz, 1.0, "Hz");
+    add_number(facts, "PRF", "prf_hz", sampling.prf_hz, 1.0, "Hz");
+    add_number(facts, "sampling rate", "sampling_rate_hz", sampling.frg_hz, 1e-6, "MHz");
+    add_number(facts, "carrier", "carrier_hz", sampling.fc_hz, 1e-9, "GHz");
+    add_number(facts, "wavelength", "wavelength_m", sampling.lambda_m, 1.0, "m");
+    add_number(facts, "range bandwidth", "range_bandwidth_hz", sampling.Brg_hz, 1e-6, "MHz");
+    add_number(facts, "azimuth bandwidth", "azimuth_bandwidth_hz", sampling.Baz_hz, 1.0, "Hz");
 }
 
 void add_corners(Facts& facts, GeneralSAR& product) {
@@ -151,7 +119,7 @@ int show_info(const InfoOptions& options) {
     if (product.GSexists(gsSamplingConstants)) add_sampling(facts, product.samplingConstants);
     add_corners(facts, product);
     add_objects(facts, product);
-    options.json ? print_json(facts.json()) : print(facts.text());
+    options.json ? print_json(facts.json()) : print(facts.text(20));
     return kFine;
 }
 

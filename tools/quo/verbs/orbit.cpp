@@ -1,17 +1,18 @@
 #include <cmath>
-#include <nlohmann/json.hpp>
 #include <optional>
 
 #include "commands.h"
 #include "date.h"
-#include "failure.h"
-#include "number.h"
+#include "facts.h"
 #include "output.h"
 #include "scene.h"
-#include "shown.h"
 
 namespace tool {
 namespace {
+
+using Json = nlohmann::ordered_json;
+
+constexpr std::size_t kWidth = 15;  // of the names
 
 struct OrbitOptions {
     std::string header;
@@ -75,56 +76,39 @@ std::vector<StateVector> state_vectors(Scene& scene, const std::vector<double>& 
     return list;
 }
 
-nlohmann::ordered_json as_json(Scene& scene, const std::vector<std::string>& findings,
-                               const std::vector<StateVector>& vectors) {
-    const auto time = [](double time_s) {
-        return nlohmann::ordered_json{{"seconds", time_s}, {"date", date_text(time_s).value_or("-")}};
-    };
+Facts facts_of(Scene& scene, const std::vector<std::string>& findings) {
     const GeneralSAROrbit& orbit = scene.orbit();
-    nlohmann::ordered_json facts{{"header", scene.name()},
-                                 {"state_vectors", orbit.nSV_n},
-                                 {"spacing_s", orbit.dtSV_s},
-                                 {"first", time(scene.first_time())},
-                                 {"last", time(scene.last_time())},
-                                 {"direction", orbit.isAscending() ? "ascending" : "descending"},
-                                 {"wavelength_m", nullptr},
-                                 {"look_side", nullptr},
-                                 {"model_error_m", orbit.orbitFitError()},
-                                 {"findings", findings}};
-    if (scene.wavelength_m()) facts["wavelength_m"] = *scene.wavelength_m();
-    if (scene.look_sign()) facts["look_side"] = *scene.look_sign() < 0 ? "left" : "right";
-    for (const StateVector& vector : vectors)
-        facts["at"].push_back({{"seconds", vector.time_s},
-                               {"date", vector.date()},
-                               {"direction", vector.direction()},
-                               {"position_m", vector.position_m},
-                               {"velocity_m_s", vector.velocity_m_s}});
+    const auto wavelength_m = scene.wavelength_m();
+    const char* side = !scene.look_sign() ? nullptr : *scene.look_sign() < 0 ? "left" : "right";
+    Facts facts;
+    const auto add_time = [&](const char* name, double time_s) {
+        const std::string date = date_text(time_s).value_or("-");
+        facts.add(name, name, exact(time_s) + " s  " + date, {{"seconds", time_s}, {"date", date}});
+    };
+    facts.add_text("header", "header", scene.name());
+    facts.add("state vectors", "state_vectors",
+              std::to_string(orbit.nSV_n) + ", " + exact(orbit.dtSV_s) + " s apart", orbit.nSV_n);
+    facts.add(nullptr, "spacing_s", "", orbit.dtSV_s);
+    add_time("first", scene.first_time());
+    add_time("last", scene.last_time());
+    facts.add_text("direction", "direction", orbit.isAscending() ? "ascending" : "descending");
+    facts.add("wavelength", "wavelength_m", wavelength_m ? exact(*wavelength_m) + " m" : "not in the header",
+              wavelength_m ? Json(*wavelength_m) : Json());
+    facts.add("look side", "look_side", side ? side : "not in the header", side ? Json(side) : Json());
+    facts.add("model error", "model_error_m", fixed(orbit.orbitFitError() * 1e3, 4) + " mm (estimate)",
+              orbit.orbitFitError());
+    if (findings.empty()) facts.add("findings", nullptr, "none", {});
+    for (const std::string& finding : findings) facts.add("finding", nullptr, finding, {});
+    facts.add(nullptr, "findings", "", findings);
     return facts;
 }
 
-/** One "name   value" line per fact. */
-std::string as_text(Scene& scene, const std::vector<std::string>& findings) {
-    const GeneralSAROrbit& orbit = scene.orbit();
-    const auto time = [](double time_s) { return exact(time_s) + " s  " + date_text(time_s).value_or("-"); };
-    std::vector<std::pair<std::string, std::string>> facts{
-        {"header", shown(scene.name())},
-        {"state vectors", std::to_string(orbit.nSV_n) + ", " + exact(orbit.dtSV_s) + " s apart"},
-        {"first", time(scene.first_time())},
-        {"last", time(scene.last_time())},
-        {"direction", orbit.isAscending() ? "ascending" : "descending"},
-        {"wavelength", scene.wavelength_m() ? exact(*scene.wavelength_m()) + " m" : "not in the header"},
-        {"look side", !scene.look_sign()       ? "not in the header"
-                      : *scene.look_sign() < 0 ? "left"
-                                               : "right"},
-        {"model error", fixed(orbit.orbitFitError() * 1e3, 4) + " mm (estimate)"},
-    };
-    if (findings.empty()) facts.emplace_back("findings", "none");
-    for (const std::string& finding : findings) facts.emplace_back("finding", finding);
-
-    constexpr std::size_t kWidth = 15;
-    std::string text;
-    for (const auto& [name, value] : facts) text += column(name, kWidth) + value + "\n";
-    return text;
+Json as_json(const StateVector& vector) {
+    return {{"seconds", vector.time_s},
+            {"date", vector.date()},
+            {"direction", vector.direction()},
+            {"position_m", vector.position_m},
+            {"velocity_m_s", vector.velocity_m_s}};
 }
 
 /** The same as comments, for a table that follows. */
@@ -148,13 +132,16 @@ int show_orbit(const OrbitOptions& options) {
     const auto vectors = state_vectors(scene, times_asked_for(options, scene, outside));
     const auto findings = scene.findings();
 
+    const Facts facts = facts_of(scene, findings);
     if (options.json) {
-        print_json(as_json(scene, findings, vectors));
+        Json json = facts.json();
+        for (const StateVector& vector : vectors) json["at"].push_back(as_json(vector));
+        print_json(json);
     } else if (vectors.empty()) {
-        print(as_text(scene, findings));
+        print(facts.text(kWidth));
     } else {
         Output output{"-"};
-        output.write(shown_lines(as_comments(as_text(scene, findings))));
+        output.write(shown_lines(as_comments(facts.text(kWidth))));
         output.write("azimuth_time_s,date,direction,x_m,y_m,z_m,vx_m_s,vy_m_s,vz_m_s\n");
         for (const StateVector& vector : vectors) output.write(as_row(vector));
         output.commit();

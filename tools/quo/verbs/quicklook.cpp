@@ -2,13 +2,10 @@
 #include <cmath>
 #include <complex>
 #include <limits>
-#include <vector>
 
 #include "apart.h"
 #include "commands.h"
-#include "failure.h"
 #include "interrupt.h"
-#include "number.h"
 #include "picture.h"
 #include "progress.h"
 #include "raster.h"
@@ -39,14 +36,11 @@ Looks looks_of(const QuicklookOptions& options, const DataFile& raster) {
                                     times(raster.NrOfLinesPerImage, 4 * std::int64_t{options.width})});
         return {looks, looks};
     }
-    const auto x = options.looks.find('x');
-    const auto azimuth = finite_number(std::string_view{options.looks}.substr(0, x));
-    const auto range =
-        x == std::string::npos ? std::nullopt : finite_number(std::string_view{options.looks}.substr(x + 1));
-    if (!azimuth || !range || !(*azimuth >= 1.0 && *azimuth <= 1e6) || !(*range >= 1.0 && *range <= 1e6)) {
+    const auto can_be = [](double looks) { return looks >= 1.0 && looks <= 1e6; };
+    const auto looks = number_pair(options.looks, 'x');
+    if (!looks || !can_be(looks->first) || !can_be(looks->second))
         throw WrongUse("--looks " + options.looks + ": not of the form AxR, such as 4x1");
-    }
-    return {static_cast<int>(*azimuth), static_cast<int>(*range)};
+    return {static_cast<int>(looks->first), static_cast<int>(looks->second)};
 }
 
 /** The mean power of looks x looks samples each, over the whole raster, read tile by tile. Looks at the far ends
@@ -69,7 +63,7 @@ public:
     void run(bool waitbar) {
         const int lines = static_cast<int>(height_) * looks_.azimuth;
         const int samples = static_cast<int>(width_) * looks_.range;
-        Progress progress{Progress::Unit::kBytes, waitbar ? "Quick look" : nullptr};
+        Progress progress{waitbar ? "Quick look" : nullptr};
         const std::int64_t bytes = file_.description().element_sizeof();
         for_each_tile(lines, samples, looks_.range, [&](const Tile& tile) {
             throw_if_interrupted();
@@ -146,13 +140,10 @@ Stretch automatic_stretch(const std::vector<float>& power) {
 
 Stretch stretch_of(const QuicklookOptions& options, const std::vector<float>& power) {
     if (options.db == "auto") return automatic_stretch(power);
-    const auto colon = options.db.find(':');
-    const auto low = finite_number(std::string_view{options.db}.substr(0, colon));
-    const auto high =
-        colon == std::string::npos ? std::nullopt : finite_number(std::string_view{options.db}.substr(colon + 1));
-    if (!low || !high || !(*low < *high))
+    const auto bounds = number_pair(options.db, ':');
+    if (!bounds || !(bounds->first < bounds->second))
         throw WrongUse("--db " + options.db + ": not of the form MIN:MAX or auto");
-    return {*low, *high};
+    return {bounds->first, bounds->second};
 }
 
 int quicklook(const QuicklookOptions& options) {

@@ -3,13 +3,10 @@
 #include <complex>
 #include <numbers>
 #include <optional>
-#include <vector>
 
 #include "apart.h"
 #include "commands.h"
-#include "failure.h"
 #include "interrupt.h"
-#include "number.h"
 #include "progress.h"
 #include "quo_base/interp.h"
 #include "raster.h"
@@ -118,18 +115,14 @@ public:
           out_{options.out, Wanted{options, in}} {}
 
     void run(bool waitbar) {
-        resample_all(waitbar);
-        throw_if_interrupted();
+        {
+            Progress progress{waitbar ? "Resampling" : nullptr};
+            lines_ ? by_strips(progress) : by_lines(progress);
+        }
         out_.commit();
-        out_.say_losses();
     }
 
 private:
-    void resample_all(bool waitbar) {
-        Progress progress{Progress::Unit::kBytes, waitbar ? "Resampling" : nullptr};
-        lines_ ? by_strips(progress) : by_lines(progress);
-    }
-
     [[nodiscard]] const RasterDescription& from() const { return in_.description(); }
     [[nodiscard]] const RasterDescription& to() const { return out_.description(); }
 

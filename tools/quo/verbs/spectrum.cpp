@@ -4,18 +4,14 @@
 #include <limits>
 #include <nlohmann/json.hpp>
 #include <numbers>
-#include <vector>
 
 #include "apart.h"
 #include "commands.h"
-#include "failure.h"
 #include "interrupt.h"
-#include "number.h"
 #include "plot.h"
 #include "progress.h"
 #include "quo_base/acquisition.h"
 #include "raster.h"
-#include "shown.h"
 #include "transform.h"
 
 namespace tool {
@@ -59,7 +55,7 @@ public:
           down_{samples_, lines_, 0, +1} {}
 
     void run(bool waitbar) {
-        Progress progress{Progress::Unit::kBytes, waitbar ? "Spectrum" : nullptr};
+        Progress progress{waitbar ? "Spectrum" : nullptr};
         const RasterDescription& raster = file_.description();
         const auto first_lines = starts(raster.NrOfLinesPerImage, lines_);
         const auto first_samples = starts(raster.NrOfPixelsPerLine, samples_);

@@ -1,15 +1,12 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
-#include <memory>
 #include <nlohmann/json.hpp>
+#include <span>
 
 #include "commands.h"
-#include "failure.h"
-#include "number.h"
 #include "residuals.h"
 #include "scene.h"
-#include "shown.h"
 #include "table.h"
 
 namespace tool {
@@ -74,19 +71,10 @@ int compare(GeneralSAROrbit& orbit, const TiePoint& tie, Agreement& agreement) {
     return 0;
 }
 
-/** The numbers of a row; throws Failure where one is missing, since a truth with holes proves nothing. */
-TiePoint tie_point(const Table& table, const std::array<std::size_t, 6>& columns) {
-    std::array<double, 6> values{};
-    if (const auto defect = table.defect()) throw Failure(table.place() + ": " + *defect);
-    for (std::size_t i = 0; i < columns.size(); ++i) {
-        const std::string_view text = table.fields()[columns[i]];
-        const auto number = finite_number(text);
-        if (!number)
-            throw Failure(table.place() + ": " + table.columns()[columns[i]] + " is \"" + std::string{text} +
-                          "\", not a number");
-        values[i] = *number;
-    }
-    return {values[0], values[1], {values[2], values[3], values[4]}, values[5]};
+/** The tie point of a row; throws Failure where a number is missing, since a truth with holes proves nothing. */
+TiePoint tie_point(const Table& table, std::span<const std::size_t> columns) {
+    const std::vector<double> v = table.numbers(columns);
+    return {v[0], v[1], {v[2], v[3], v[4]}, v[5]};
 }
 
 Vertical vertical_of(const Table& table, const std::string& option) {
@@ -116,9 +104,9 @@ Agreement check_scene(const std::string& header, const TiepointsOptions& options
     scene.require_look_side();
     scene.require_wavelength();
     Table table{options.points.empty() ? points_beside(header) : options.points};
-    const std::array<std::size_t, 6> columns{table.need("azimuth_time_s"), table.need("range_time_s"),
-                                             table.need("latitude_deg"),   table.need("longitude_deg"),
-                                             table.need("height_m"),       table.need("incidence_deg")};
+    const std::size_t columns[] = {table.need("azimuth_time_s"), table.need("range_time_s"),
+                                   table.need("latitude_deg"),   table.need("longitude_deg"),
+                                   table.need("height_m"),       table.need("incidence_deg")};
     Agreement agreement{
         .scene = scene_name(header), .vertical = vertical_of(table, options.incidence), .residuals = {}};
     while (table.next()) {
@@ -202,18 +190,17 @@ constexpr const char* kDetails =
 }  // namespace
 
 void add_tiepoints(CLI::App& app, Job& job) {
-    auto options = std::make_shared<TiepointsOptions>();
-    CLI::App* command = app.add_subcommand("tiepoints", kAbout)->footer(kDetails);
-    command->add_option("HEADER", options->headers, "Product headers")->required();
-    command->add_option("--points", options->points, "Tie points of the one header given");
+    const auto [command, options] = add_verb(app, job, "tiepoints", kAbout, check_tiepoints);
+    command->footer(kDetails);
+    command->add_option("HEADER", options.headers, "Product headers")->required();
+    command->add_option("--points", options.points, "Tie points of the one header given");
     command
         ->add_option(
-            "--incidence", options->incidence,
+            "--incidence", options.incidence,
             "What the incidence is measured against; else as the comment \"incidence: geocentric radius\" or "
             "\"incidence: ellipsoid normal\" says")
         ->check(CLI::IsMember({"normal", "geocentric"}));
-    command->add_flag("--json", options->json, "Print JSON");
-    command->callback([options, &job] { job = [options] { return check_tiepoints(*options); }; });
+    command->add_flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

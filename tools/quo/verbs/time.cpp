@@ -2,9 +2,6 @@
 
 #include "commands.h"
 #include "date.h"
-#include "failure.h"
-#include "number.h"
-#include "shown.h"
 
 namespace tool {
 namespace {

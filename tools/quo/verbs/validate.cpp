@@ -1,21 +1,15 @@
 #include <algorithm>
 #include <cmath>
 #include <filesystem>
-#include <memory>
 #include <nlohmann/json.hpp>
 #include <numeric>
-#include <string_view>
-#include <vector>
 
 #include "commands.h"
 #include "document.h"
-#include "failure.h"
 #include "field_check.h"
-#include "number.h"
 #include "product.h"
 #include "raster.h"
 #include "scene.h"
-#include "shown.h"
 
 namespace tool {
 namespace {
@@ -356,10 +350,15 @@ private:
     std::vector<Finding> findings_;
 };
 
-int validate(const std::string& header, bool json) {
+struct ValidateOptions {
+    std::string header;
+    bool json = false;
+};
+
+int validate(const ValidateOptions& options) {
     GeneralSAR product;
-    read_product(header, product);
-    const std::vector<Finding> findings = Validation{product, header}.run();
+    read_product(options.header, product);
+    const std::vector<Finding> findings = Validation{product, options.header}.run();
     nlohmann::ordered_json list = nlohmann::json::array();
     std::string text;
     int errors = 0;
@@ -375,22 +374,17 @@ int validate(const std::string& header, bool json) {
         return std::to_string(number) + " " + what + (number == 1 ? "" : "s");
     };
     text += count(errors, "error") + ", " + count(static_cast<int>(findings.size()) - errors, "warning") + "\n";
-    json ? print_json(list) : print(text);
+    options.json ? print_json(list) : print(text);
     return errors == 0 ? kFine : kFindings;
 }
 
 }  // namespace
 
 void add_validate(CLI::App& app, Job& job) {
-    struct Options {
-        std::string header;
-        bool json = false;
-    };
-    auto options = std::make_shared<Options>();
-    CLI::App* command = app.add_subcommand("validate", "Checks a product: bounds, and what does not fit together");
-    command->add_option("HEADER", options->header, "Product header")->required();
-    command->add_flag("--json", options->json, "Print JSON");
-    command->callback([options, &job] { job = [options] { return validate(options->header, options->json); }; });
+    const auto [command, options] =
+        add_verb(app, job, "validate", "Checks a product: bounds, and what does not fit together", validate);
+    command->add_option("HEADER", options.header, "Product header")->required();
+    command->add_flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

@@ -1,10 +1,8 @@
 #include <array>
 #include <filesystem>
-#include <string_view>
 
 #include "apart.h"
 #include "commands.h"
-#include "failure.h"
 #include "output.h"
 #include "raster.h"
 
