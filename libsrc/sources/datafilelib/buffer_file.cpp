@@ -368,42 +368,20 @@ void BufferFile::writeBlock(const void* src, int memory_type, int first_line, in
     dropBuffer(*next);
 }
 
-void BufferFile::readbuffer(float* dst, int line, int lines, int sample, int samples) {
-    readBlock(dst, FLOAT32, line, lines, sample, samples);
-}
-void BufferFile::readbuffer(double* dst, int line, int lines, int sample, int samples) {
-    readBlock(dst, FLOAT64, line, lines, sample, samples);
-}
-void BufferFile::readbuffer(int* dst, int line, int lines, int sample, int samples) {
-    readBlock(dst, INT32, line, lines, sample, samples);
-}
-void BufferFile::readbuffer(short* dst, int line, int lines, int sample, int samples) {
-    readBlock(dst, INT16, line, lines, sample, samples);
-}
-void BufferFile::readbuffer(fcomplex* dst, int line, int lines, int sample, int samples) {
-    readBlock(dst, FLOAT_COMPLEX, line, lines, sample, samples);
-}
-void BufferFile::readbuffer(dcomplex* dst, int line, int lines, int sample, int samples) {
-    readBlock(dst, DOUBLE_COMPLEX, line, lines, sample, samples);
-}
-void BufferFile::writebuffer(const float* src, int line, int lines, int sample, int samples) {
-    writeBlock(src, FLOAT32, line, lines, sample, samples);
-}
-void BufferFile::writebuffer(const double* src, int line, int lines, int sample, int samples) {
-    writeBlock(src, FLOAT64, line, lines, sample, samples);
-}
-void BufferFile::writebuffer(const int* src, int line, int lines, int sample, int samples) {
-    writeBlock(src, INT32, line, lines, sample, samples);
-}
-void BufferFile::writebuffer(const short* src, int line, int lines, int sample, int samples) {
-    writeBlock(src, INT16, line, lines, sample, samples);
-}
-void BufferFile::writebuffer(const fcomplex* src, int line, int lines, int sample, int samples) {
-    writeBlock(src, FLOAT_COMPLEX, line, lines, sample, samples);
-}
-void BufferFile::writebuffer(const dcomplex* src, int line, int lines, int sample, int samples) {
-    writeBlock(src, DOUBLE_COMPLEX, line, lines, sample, samples);
-}
+#define QUO_BLOCKS_OF(T, cell_type)                                                            \
+    void BufferFile::readbuffer(T* dst, int line, int lines, int sample, int samples) {        \
+        readBlock(dst, cell_type, line, lines, sample, samples);                               \
+    }                                                                                          \
+    void BufferFile::writebuffer(const T* src, int line, int lines, int sample, int samples) { \
+        writeBlock(src, cell_type, line, lines, sample, samples);                              \
+    }
+QUO_BLOCKS_OF(float, FLOAT32)
+QUO_BLOCKS_OF(double, FLOAT64)
+QUO_BLOCKS_OF(int, INT32)
+QUO_BLOCKS_OF(short, INT16)
+QUO_BLOCKS_OF(fcomplex, FLOAT_COMPLEX)
+QUO_BLOCKS_OF(dcomplex, DOUBLE_COMPLEX)
+#undef QUO_BLOCKS_OF
 
 bool BufferFile::prefixRegion(int first_line, int lines, quo::RasterRegion& region) const {
     const auto found = quo::region_of_prefixes(*this, first_line, lines);

@@ -234,97 +234,50 @@ extern "C" int GetMyProfileStringArray(const char* section, const char* key, cha
     return quo::read_strings(access, strings, count, room);
 }
 
-extern "C" int WriteMyProfileStringArray(const char* section, const char* key, const char* const* strings,
-                                         int count, const char* file) noexcept {
-    Access access{"WriteMyProfileStringArray", section, key, file};
-    return quo::write_list(access, strings, count);
-}
+#define QUO_READS_LIST(name, Number)                                                     \
+    extern "C" int name(const char* section, const char* key, Number* values, int count, \
+                        const char* file) noexcept {                                     \
+        Access access{#name, section, key, file};                                        \
+        return quo::read_list(access, values, count);                                    \
+    }
+QUO_READS_LIST(GetMyProfileIntArray, int)
+QUO_READS_LIST(GetMyProfileInt64Array, int64_t)
+QUO_READS_LIST(GetMyProfileLongArray, int32_t)
+QUO_READS_LIST(GetMyProfileFloatArray, float)
+QUO_READS_LIST(GetProfileDoubleArray, double)
+#undef QUO_READS_LIST
 
-extern "C" int WriteMyProfileStringMatrix(const char* section, const char* key, const char* const* strings,
-                                          int rows, int columns, const char* file) noexcept {
-    Access access{"WriteMyProfileStringMatrix", section, key, file};
-    return quo::write_matrix(access, strings, rows, columns);
-}
+#define QUO_WRITES_LIST(name, Cell)                                                          \
+    extern "C" int name(const char* section, const char* key, const Cell* values, int count, \
+                        const char* file) noexcept {                                         \
+        Access access{#name, section, key, file};                                            \
+        return quo::write_list(access, values, count);                                       \
+    }
+using Text = const char*;
+QUO_WRITES_LIST(WriteMyProfileStringArray, Text)
+QUO_WRITES_LIST(WriteMyProfileIntArray, int)
+QUO_WRITES_LIST(WriteMyProfileInt64Array, int64_t)
+QUO_WRITES_LIST(WriteMyProfileLongArray, int32_t)
+QUO_WRITES_LIST(WriteMyProfileFloatArray, float)
+QUO_WRITES_LIST(WriteProfileDoubleArray, double)
+#undef QUO_WRITES_LIST
 
-extern "C" int GetMyProfileIntArray(const char* section, const char* key, int* values, int count,
-                                    const char* file) noexcept {
-    Access access{"GetMyProfileIntArray", section, key, file};
-    return quo::read_list(access, values, count);
-}
+#define QUO_WRITES_MATRIX(name, Cell)                                                                    \
+    extern "C" int name(const char* section, const char* key, const Cell* values, int rows, int columns, \
+                        const char* file) noexcept {                                                     \
+        Access access{#name, section, key, file};                                                        \
+        return quo::write_matrix(access, values, rows, columns);                                         \
+    }
+QUO_WRITES_MATRIX(WriteMyProfileStringMatrix, Text)
+QUO_WRITES_MATRIX(WriteMyProfileDoubleMatrix, double)
+#undef QUO_WRITES_MATRIX
 
-extern "C" int WriteMyProfileIntArray(const char* section, const char* key, const int* values, int count,
-                                      const char* file) noexcept {
-    Access access{"WriteMyProfileIntArray", section, key, file};
-    return quo::write_list(access, values, count);
-}
-
-extern "C" int WriteMyProfileInt(const char* section, const char* key, int value, const char* file) noexcept {
-    Access access{"WriteMyProfileInt", section, key, file};
-    return quo::write_number(access, value);
-}
-
-extern "C" int GetMyProfileInt64Array(const char* section, const char* key, int64_t* values, int count,
-                                      const char* file) noexcept {
-    Access access{"GetMyProfileInt64Array", section, key, file};
-    return quo::read_list(access, values, count);
-}
-
-extern "C" int WriteMyProfileInt64Array(const char* section, const char* key, const int64_t* values, int count,
-                                        const char* file) noexcept {
-    Access access{"WriteMyProfileInt64Array", section, key, file};
-    return quo::write_list(access, values, count);
-}
-
-extern "C" int WriteMyProfileInt64(const char* section, const char* key, int64_t value,
-                                   const char* file) noexcept {
-    Access access{"WriteMyProfileInt64", section, key, file};
-    return quo::write_number(access, value);
-}
-
-extern "C" int GetMyProfileLongArray(const char* section, const char* key, int32_t* values, int count,
-                                     const char* file) noexcept {
-    Access access{"GetMyProfileLongArray", section, key, file};
-    return quo::read_list(access, values, count);
-}
-
-extern "C" int WriteMyProfileLongArray(const char* section, const char* key, const int32_t* values, int count,
-                                       const char* file) noexcept {
-    Access access{"WriteMyProfileLongArray", section, key, file};
-    return quo::write_list(access, values, count);
-}
-
-extern "C" int GetMyProfileFloatArray(const char* section, const char* key, float* values, int count,
-                                      const char* file) noexcept {
-    Access access{"GetMyProfileFloatArray", section, key, file};
-    return quo::read_list(access, values, count);
-}
-
-extern "C" int WriteMyProfileFloatArray(const char* section, const char* key, const float* values, int count,
-                                        const char* file) noexcept {
-    Access access{"WriteMyProfileFloatArray", section, key, file};
-    return quo::write_list(access, values, count);
-}
-
-extern "C" int GetProfileDoubleArray(const char* section, const char* key, double* values, int count,
-                                     const char* file) noexcept {
-    Access access{"GetProfileDoubleArray", section, key, file};
-    return quo::read_list(access, values, count);
-}
-
-extern "C" int WriteProfileDoubleArray(const char* section, const char* key, const double* values, int count,
-                                       const char* file) noexcept {
-    Access access{"WriteProfileDoubleArray", section, key, file};
-    return quo::write_list(access, values, count);
-}
-
-extern "C" int WriteMyProfileDouble(const char* section, const char* key, double value,
-                                    const char* file) noexcept {
-    Access access{"WriteMyProfileDouble", section, key, file};
-    return quo::write_number(access, value);
-}
-
-extern "C" int WriteMyProfileDoubleMatrix(const char* section, const char* key, const double* values, int rows,
-                                          int columns, const char* file) noexcept {
-    Access access{"WriteMyProfileDoubleMatrix", section, key, file};
-    return quo::write_matrix(access, values, rows, columns);
-}
+#define QUO_WRITES_NUMBER(name, Number)                                                                  \
+    extern "C" int name(const char* section, const char* key, Number value, const char* file) noexcept { \
+        Access access{#name, section, key, file};                                                        \
+        return quo::write_number(access, value);                                                         \
+    }
+QUO_WRITES_NUMBER(WriteMyProfileInt, int)
+QUO_WRITES_NUMBER(WriteMyProfileInt64, int64_t)
+QUO_WRITES_NUMBER(WriteMyProfileDouble, double)
+#undef QUO_WRITES_NUMBER

@@ -48,36 +48,23 @@ extern "C" void GetCheckMyProfileStringArray(const char* section, const char* ke
         end_failed_check("GetMyProfileStringArray", section, key, file);
 }
 
-extern "C" void GetCheckMyProfileIntArray(const char* section, const char* key, int* values, int count,
-                                          const char* file) noexcept {
-    if (GetMyProfileIntArray(section, key, values, count, file) != 0)
-        end_failed_check("GetMyProfileIntArray", section, key, file);
-}
-
-extern "C" void GetCheckMyProfileInt64Array(const char* section, const char* key, int64_t* values, int count,
-                                            const char* file) noexcept {
-    if (GetMyProfileInt64Array(section, key, values, count, file) != 0)
-        end_failed_check("GetMyProfileInt64Array", section, key, file);
-}
-
-extern "C" void GetCheckMyProfileLongArray(const char* section, const char* key, int32_t* values, int count,
-                                           const char* file) noexcept {
-    // This message and three below name another function: they are kept as users have known them.
-    if (GetMyProfileLongArray(section, key, values, count, file) != 0)
-        end_failed_check("GetMyProfileIntArray", section, key, file);
-}
-
-extern "C" void WriteCheckMyProfileIntArray(const char* section, const char* key, const int* values, int count,
-                                            const char* file) noexcept {
-    if (WriteMyProfileIntArray(section, key, values, count, file) != 0)
-        end_failed_check("WriteMyProfileIntArray", section, key, file);
-}
-
-extern "C" void WriteCheckMyProfileInt64Array(const char* section, const char* key, const int64_t* values,
-                                              int count, const char* file) noexcept {
-    if (WriteMyProfileInt64Array(section, key, values, count, file) != 0)
-        end_failed_check("WriteMyProfileInt64Array", section, key, file);
-}
+// Four messages name another function: they are kept as users have known them.
+#define QUO_CHECKS_LIST(name, plain, Number, named)                                                     \
+    extern "C" void name(const char* section, const char* key, Number* values, int count,               \
+                         const char* file) noexcept {                                                   \
+        if (plain(section, key, values, count, file) != 0) end_failed_check(named, section, key, file); \
+    }
+QUO_CHECKS_LIST(GetCheckMyProfileIntArray, GetMyProfileIntArray, int, "GetMyProfileIntArray")
+QUO_CHECKS_LIST(GetCheckMyProfileInt64Array, GetMyProfileInt64Array, int64_t, "GetMyProfileInt64Array")
+QUO_CHECKS_LIST(GetCheckMyProfileLongArray, GetMyProfileLongArray, int32_t, "GetMyProfileIntArray")
+QUO_CHECKS_LIST(GetCheckMyProfileFloatArray, GetMyProfileFloatArray, float, "GetMyProfileFloatArray")
+QUO_CHECKS_LIST(GetCheckMyProfileDoubleArray, GetProfileDoubleArray, double, "WriteMyProfileDouble")
+QUO_CHECKS_LIST(WriteCheckMyProfileIntArray, WriteMyProfileIntArray, const int, "WriteMyProfileIntArray")
+QUO_CHECKS_LIST(WriteCheckMyProfileInt64Array, WriteMyProfileInt64Array, const int64_t, "WriteMyProfileInt64Array")
+QUO_CHECKS_LIST(WriteCheckMyProfileLongArray, WriteMyProfileLongArray, const int32_t, "WriteMyProfileLongArray")
+QUO_CHECKS_LIST(WriteCheckMyProfileFloatArray, WriteMyProfileFloatArray, const float, "WriteMyProfileDouble")
+QUO_CHECKS_LIST(WriteCheckMyProfileDoubleArray, WriteProfileDoubleArray, const double, "WriteMyProfileDouble")
+#undef QUO_CHECKS_LIST
 
 extern "C" void WriteCheckMyProfileInt(const char* section, const char* key, int value,
                                        const char* file) noexcept {
@@ -94,42 +81,12 @@ extern "C" void WriteCheckMyProfileInt64(const char* section, const char* key, i
     end_failed_check("WriteMyProfileInt64", section, key, file, "value ", text);
 }
 
-extern "C" void WriteCheckMyProfileLongArray(const char* section, const char* key, const int32_t* values,
-                                             int count, const char* file) noexcept {
-    if (WriteMyProfileLongArray(section, key, values, count, file) != 0)
-        end_failed_check("WriteMyProfileLongArray", section, key, file);
-}
-
-extern "C" void GetCheckMyProfileFloatArray(const char* section, const char* key, float* values, int count,
-                                            const char* file) noexcept {
-    if (GetMyProfileFloatArray(section, key, values, count, file) != 0)
-        end_failed_check("GetMyProfileFloatArray", section, key, file);
-}
-
 extern "C" void WriteCheckMyProfileDouble(const char* section, const char* key, double value,
                                           const char* file) noexcept {
     if (WriteMyProfileDouble(section, key, value, file) == 0) return;
     char text[kDecimalRoom];
     quo::format_bounded(text, sizeof text, "%f", value);
     end_failed_check("WriteMyProfileDouble", section, key, file, "value ", text);
-}
-
-extern "C" void WriteCheckMyProfileFloatArray(const char* section, const char* key, const float* values, int count,
-                                              const char* file) noexcept {
-    if (WriteMyProfileFloatArray(section, key, values, count, file) != 0)
-        end_failed_check("WriteMyProfileDouble", section, key, file);
-}
-
-extern "C" void WriteCheckMyProfileDoubleArray(const char* section, const char* key, const double* values,
-                                               int count, const char* file) noexcept {
-    if (WriteProfileDoubleArray(section, key, values, count, file) != 0)
-        end_failed_check("WriteMyProfileDouble", section, key, file);
-}
-
-extern "C" void GetCheckMyProfileDoubleArray(const char* section, const char* key, double* values, int count,
-                                             const char* file) noexcept {
-    if (GetProfileDoubleArray(section, key, values, count, file) != 0)
-        end_failed_check("WriteMyProfileDouble", section, key, file);
 }
 
 extern "C" int GetParString(const char* file, const char* key, int /*count*/, char* buffer, int /*ignored*/,
@@ -142,32 +99,16 @@ extern "C" int SetParString(const char* file, const char* key, int /*count*/, co
     return synced(file, WriteMyProfileString(section, key, value, file));
 }
 
-extern "C" int GetParInt(const char* file, const char* key, int count, int* values, int /*ignored*/,
-                         const char* section) noexcept {
-    return GetMyProfileIntArray(section, key, values, count, file);
-}
-
-extern "C" int SetParInt(const char* file, const char* key, int count, const int* values, int /*ignored*/,
-                         const char* section) noexcept {
-    return synced(file, WriteMyProfileIntArray(section, key, values, count, file));
-}
-
-extern "C" int GetParFloat(const char* file, const char* key, int count, float* values, int /*ignored*/,
-                           const char* section) noexcept {
-    return GetMyProfileFloatArray(section, key, values, count, file);
-}
-
-extern "C" int SetParFloat(const char* file, const char* key, int count, const float* values, int /*ignored*/,
-                           const char* section) noexcept {
-    return synced(file, WriteMyProfileFloatArray(section, key, values, count, file));
-}
-
-extern "C" int GetParDouble(const char* file, const char* key, int count, double* values, int /*ignored*/,
-                            const char* section) noexcept {
-    return GetProfileDoubleArray(section, key, values, count, file);
-}
-
-extern "C" int SetParDouble(const char* file, const char* key, int count, const double* values, int /*ignored*/,
-                            const char* section) noexcept {
-    return synced(file, WriteProfileDoubleArray(section, key, values, count, file));
-}
+#define QUO_PAR_LIST(Get, Set, Number, read, write)                                                         \
+    extern "C" int Get(const char* file, const char* key, int count, Number* values, int /*ignored*/,       \
+                       const char* section) noexcept {                                                      \
+        return read(section, key, values, count, file);                                                     \
+    }                                                                                                       \
+    extern "C" int Set(const char* file, const char* key, int count, const Number* values, int /*ignored*/, \
+                       const char* section) noexcept {                                                      \
+        return synced(file, write(section, key, values, count, file));                                      \
+    }
+QUO_PAR_LIST(GetParInt, SetParInt, int, GetMyProfileIntArray, WriteMyProfileIntArray)
+QUO_PAR_LIST(GetParFloat, SetParFloat, float, GetMyProfileFloatArray, WriteMyProfileFloatArray)
+QUO_PAR_LIST(GetParDouble, SetParDouble, double, GetProfileDoubleArray, WriteProfileDoubleArray)
+#undef QUO_PAR_LIST
