@@ -7,14 +7,13 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <optional>
 
 #include "diagnosticslib/call_stack.h"
 #include "diagnosticslib/errno_kept.h"
 #include "diagnosticslib/report.h"
 #include "diagnosticslib/tracking_table.h"
+#include "sarutillib/ground/aligned_block.h"
 #include "sarutillib/ground/bounded_text.h"
-#include "sarutillib/ground/checked_size.h"
 
 quo::CallStack quo::call_stack;
 
@@ -23,7 +22,6 @@ namespace {
 using quo::call_stack;
 
 constexpr char kSource[] = "ckerr.cpp";
-constexpr std::size_t kAlignment = 16;
 constexpr std::size_t kHugePage = std::size_t{2} << 20;
 constexpr std::size_t kHugeFrom = 2 * kHugePage;
 
@@ -40,13 +38,6 @@ void reset_calls_and_blocks(bool tracking) noexcept {
     tracked.clear();
 }
 
-// ---- system memory: each block stands at the first multiple of 16 strictly above the address that the system
-// gave, and the pointer-sized word just below the block holds that address.
-
-std::optional<std::size_t> system_size(std::size_t count, std::size_t size) noexcept {
-    return (quo::Checked<std::size_t>{count} * size + kAlignment).value();
-}
-
 /** Fresh memory is asked for in huge pages where the system has them: touching it for the first time costs a
  * tenth. */
 void prefer_huge_pages(void* system, std::size_t bytes) noexcept {
@@ -55,19 +46,7 @@ void prefer_huge_pages(void* system, std::size_t bytes) noexcept {
     madvise(static_cast<char*>(system) + step, (bytes - step) / kHugePage * kHugePage, MADV_HUGEPAGE);
 }
 
-void* aligned_block(void* system) noexcept {
-    if (!system) return nullptr;
-    const std::size_t step = kAlignment - reinterpret_cast<std::uintptr_t>(system) % kAlignment;
-    char* block = static_cast<char*>(system) + step;
-    std::memcpy(block - sizeof system, &system, sizeof system);
-    return block;
-}
-
-void release_block(void* block) noexcept {
-    void* system = nullptr;
-    std::memcpy(&system, static_cast<char*>(block) - sizeof system, sizeof system);
-    std::free(system);
-}
+void release_block(void* block) noexcept { std::free(quo::system_memory(block)); }
 
 using SystemAllocator = void*(std::size_t bytes);
 void* plain_memory(std::size_t bytes) noexcept { return std::malloc(bytes); }
@@ -79,11 +58,11 @@ void* allocate(std::size_t count, std::size_t size, SystemAllocator* system, con
         quo_add_report("Too many tracked blocks", QUO_ERROR, line, function, kSource);
         return nullptr;
     }
-    const auto bytes = system_size(count, size);
+    const auto bytes = quo::system_bytes(count, size);
     if (!bytes) errno = ENOMEM;
     void* const memory = bytes ? system(*bytes) : nullptr;
     if (memory && *bytes >= kHugeFrom) prefer_huge_pages(memory, *bytes);
-    void* const block = aligned_block(memory);
+    void* const block = quo::aligned_block(memory);
     if (call_stack.tracking) tracked.add(block, call_stack);  // a failed allocation leaves a null entry
     return block;
 }
@@ -135,7 +114,7 @@ extern "C" void* calloc_ckerr(size_t count, size_t size) noexcept {
 
 extern "C" void free_ckerr(void* block) noexcept {
     // The system's free() will want the words below the block: they are fetched while the table is searched.
-    if (block) __builtin_prefetch(static_cast<char*>(block) - kAlignment);
+    if (block) __builtin_prefetch(static_cast<char*>(block) - quo::kBlockAlignment);
     // A block that is not in the table may have been freed already, with the call that owned it.
     if (call_stack.tracking && !tracked.remove(block)) return;
     if (block) release_block(block);

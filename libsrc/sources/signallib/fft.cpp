@@ -3,12 +3,11 @@
 #include <algorithm>
 #include <cstdint>
 #include <cstdlib>
-#include <cstring>
 #include <limits>
 #include <optional>
 
 #include "diagnosticslib/errno_kept.h"
-#include "sarutillib/ground/checked_size.h"
+#include "sarutillib/ground/aligned_block.h"
 #include "signallib/image_size.h"
 #include "signallib/plan_store.h"
 
@@ -183,22 +182,6 @@ int first_smooth(int first, std::int64_t step) {
     return best > kMost ? 0 : static_cast<int>(best);
 }
 
-/** Distance from an aligned buffer down to where the address of its system block is kept. */
-constexpr std::size_t kBlockHead = 16;
-
-std::optional<std::size_t> block_bytes(size_t count, size_t size) {
-    return (quo::Checked<std::size_t>{count} * size + kBlockHead).value();
-}
-
-/** Moves to the next multiple of 16 behind the block's start, and keeps the start's address just before it. */
-void* aligned_within(void* block) {
-    if (!block) return nullptr;
-    const auto start = reinterpret_cast<std::uintptr_t>(block);
-    char* const aligned = static_cast<char*>(block) + (kBlockHead - start % kBlockHead);
-    std::memcpy(aligned - sizeof block, &block, sizeof block);
-    return aligned;
-}
-
 }  // namespace
 
 extern "C" {
@@ -269,20 +252,17 @@ int ifftshift(fcomplex* data, int n, int rows) noexcept {
 }
 
 void* fft_malloc(size_t bytes) noexcept {
-    const auto all = block_bytes(1, bytes);
-    return all ? aligned_within(std::malloc(*all)) : nullptr;
+    const auto all = quo::system_bytes(1, bytes);
+    return all ? quo::aligned_block(std::malloc(*all)) : nullptr;
 }
 
 void* fft_calloc(size_t count, size_t size) noexcept {
-    const auto all = block_bytes(count, size);
-    return all ? aligned_within(std::calloc(*all, 1)) : nullptr;
+    const auto all = quo::system_bytes(count, size);
+    return all ? quo::aligned_block(std::calloc(*all, 1)) : nullptr;
 }
 
 void fft_free(void* buffer) noexcept {
-    if (!buffer) return;
-    void* block = nullptr;
-    std::memcpy(&block, static_cast<char*>(buffer) - sizeof block, sizeof block);
-    std::free(block);
+    if (buffer) std::free(quo::system_memory(buffer));
 }
 
 }  // extern "C"
