@@ -21,37 +21,27 @@ constexpr const char* kSource = "generalSAR_configuration";
 using quo::HeaderTree;
 using quo::Node;
 
-/** Goes through the values of an array as they are read: `val` elements, or else one list. */
-class ArrayCheck {
-public:
-    ArrayCheck(const parElement& element, const HeaderTree& tree, Node node) : element_{element} {
-        for (Node child = tree.first(node); child != Node::none; child = tree.next(child)) {
-            if (tree.is_named(child, "val")) see(quo::NodeText{tree, child});
-        }
-        if (count_ == 0) see_list(quo::NodeText{tree, node});
-    }
-    [[nodiscard]] std::string reason() const {
-        const std::string wrong = element_.countDefect(count_);
-        return wrong.empty() ? reason_ : wrong;
-    }
-
-private:
-    void see(std::string_view text) {
-        ++count_;
-        if (reason_.empty()) reason_ = element_.defect(text);
-    }
-    void see_list(std::string_view list) {
-        while (!quo::trimmed(list).empty()) {
+/** What is wrong with the values of an array, which stand in `val` elements or else in one list; or nothing. */
+std::string array_defect(const parElement& element, const HeaderTree& tree, Node node) {
+    std::size_t count = 0;
+    std::string first_defect;
+    const auto see = [&](std::string_view text) {
+        ++count;
+        if (first_defect.empty()) first_defect = element.defect(text);
+    };
+    for (Node child = tree.first(node); child != Node::none; child = tree.next(child))
+        if (tree.is_named(child, "val")) see(quo::NodeText{tree, child});
+    if (count == 0) {
+        const quo::NodeText text{tree, node};
+        for (std::string_view list = text; !quo::trimmed(list).empty();) {
             const auto comma = list.find(',');
             see(list.substr(0, comma));
             list = comma == std::string_view::npos ? std::string_view{} : list.substr(comma + 1);
         }
     }
-
-    const parElement& element_;
-    std::size_t count_ = 0;
-    std::string reason_;
-};
+    const std::string wrong = element.countDefect(count);
+    return wrong.empty() ? first_defect : wrong;
+}
 
 /** Compares one section with its record. */
 class SectionReview {
@@ -94,7 +84,7 @@ private:
         Expected& expected = found->second;
         seen_own_ = seen_own_ || expected.own;
         if (std::exchange(expected.seen, true)) return find(name, "stands there more than once");
-        std::string reason = expected.element.count > 1 ? ArrayCheck{expected.element, tree, node}.reason()
+        std::string reason = expected.element.count > 1 ? array_defect(expected.element, tree, node)
                                                         : expected.element.defect(quo::NodeText{tree, node});
         if (!reason.empty()) find(name, std::move(reason));
     }
