@@ -1,5 +1,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sys/inotify.h>
+#include <unistd.h>
 
 #include <cstring>
 #include <filesystem>
@@ -118,6 +120,19 @@ TEST_F(Configuration, ContainerReadsAllOrThrowsAtTheFirst) {
     EXPECT_EQ(report_.messages("ERROR").back(), "File : " + missing + " DOES NOT EXIST!");
     EXPECT_EQ(partial.GSread(nullptr, 1), 1);
     EXPECT_THROW(all.GSwrite(report_.file("no_such_folder/c.xml").c_str(), 1), quorelException);
+}
+
+// What six records and the shared parameters say is parsed once; the other look tells whether the file is there.
+TEST_F(Configuration, ContainerOpensItsFileTwice) {
+    GeneralSAR_configuration all;
+    for (int i = 0; i < 6; ++i) all.GSenable(static_cast<GScObject>(i));
+    ASSERT_EQ(all.GSwrite(file_.c_str(), 1), 0);
+    const int watch = inotify_init1(IN_NONBLOCK);
+    ASSERT_GE(inotify_add_watch(watch, file_.c_str(), IN_OPEN | IN_CLOSE), 0);
+    ASSERT_EQ(all.GSread(file_.c_str(), 1), 0);
+    char events[100 * sizeof(inotify_event)];  // of a file that is watched itself they bear no name
+    EXPECT_EQ(read(watch, events, sizeof events), 2 * 2 * static_cast<ssize_t>(sizeof(inotify_event)));
+    close(watch);
 }
 
 TEST_F(Configuration, GeneralRecordReadsAtConstruction) {
