@@ -22,9 +22,7 @@ class Chip {
 public:
     Chip(BufferFile& image, int line, int sample, double doppler_cycles);
 
-    [[nodiscard]] fcomplex at(int row, int column) const {
-        return fine_[static_cast<std::size_t>(row) * kFine + static_cast<std::size_t>(column)];
-    }
+    [[nodiscard]] fcomplex at(int row, int column) const { return fine_[row * kFine + column]; }
     [[nodiscard]] double power(int row, int column) const {
         return static_cast<double>(std::norm(at(row, column)));
     }
@@ -79,14 +77,16 @@ double parabola_peak(double before, double middle, double after) {
 struct Cut {
     std::vector<double> powers;
     int peak;
-    [[nodiscard]] int size() const { return static_cast<int>(powers.size()); }
-    [[nodiscard]] double at(int i) const { return powers[static_cast<std::size_t>(i)]; }
+    /** Whether there is a place beside this one, to one side. */
+    [[nodiscard]] bool goes_on(int i, int direction) const {
+        return i + direction >= 0 && i + direction < static_cast<int>(powers.size());
+    }
 };
 
 /** Steps from the peak to the place where the power falls below a level, to one side. */
 double steps_to(const Cut& cut, double level, int direction) {
-    for (int i = cut.peak; i > 0 && i + 1 < cut.size(); i += direction) {
-        const double here = cut.at(i), next = cut.at(i + direction);
+    for (int i = cut.peak; cut.goes_on(i, direction); i += direction) {
+        const double here = cut.powers[i], next = cut.powers[i + direction];
         if (next < level) return std::abs(i - cut.peak) + (here - level) / (here - next);
     }
     throw Failure{"a response without an end"};
@@ -95,18 +95,18 @@ double steps_to(const Cut& cut, double level, int direction) {
 /** The first minimum to one side of the peak. */
 int null_of(const Cut& cut, int direction) {
     int i = cut.peak;
-    while (i > 0 && i + 1 < cut.size() && cut.at(i + direction) < cut.at(i)) i += direction;
+    while (cut.goes_on(i, direction) && cut.powers[i + direction] < cut.powers[i]) i += direction;
     return i;
 }
 
 Response respond(const Cut& cut, double shift, double theory) {
-    const double top = cut.at(cut.peak);
+    const double top = cut.powers[cut.peak];
     const double width = steps_to(cut, 0.5 * top, -1) + steps_to(cut, 0.5 * top, +1);
     const int left = null_of(cut, -1), right = null_of(cut, +1);
     const int reach = static_cast<int>(10.0 * theory * kFiner);
     double main = 0.0, side = 0.0, highest = 0.0;
     for (int i = std::max(0, cut.peak - reach); i <= std::min(kFine - 1, cut.peak + reach); ++i) {
-        const double power = cut.at(i);
+        const double power = cut.powers[i];
         const bool inside = i >= left && i <= right;
         (inside ? main : side) += power;
         if (!inside) highest = std::max(highest, power);
@@ -114,39 +114,30 @@ Response respond(const Cut& cut, double shift, double theory) {
     return {shift, width / kFiner, theory, 10.0 * std::log10(highest / top), 10.0 * std::log10(side / main)};
 }
 
-/** Finds one target after the other in an open image. */
-class Finder {
-public:
-    explicit Finder(const std::string& image);
-    Measurement find(const Target& target);
-
-private:
-    GeneralSAR product_;
-};
-
-Finder::Finder(const std::string& image) {
+/** Opens an image by its header. */
+void open_image(const std::string& image, GeneralSAR& product) {
     const std::string header = image + ".hdr";
-    require(product_.GSread(header.c_str()), header + ": cannot be read");
+    require(product.GSread(header.c_str()), header + ": cannot be read");
     for (const GSObject object : {gsOrbit, gsRoi, gsPolySAR, gsSamplingConstants, gsBufferFile})
-        if (!product_.GSexists(object)) throw Failure{header + ": a section is missing"};
-    product_.bufferFile.setFilename(image.c_str());
-    product_.bufferFile.open(BufferFile::READ);
-    if (!product_.bufferFile.is_open()) throw Failure{image + ": cannot be read"};
+        if (!product.GSexists(object)) throw Failure{header + ": a section is missing"};
+    product.bufferFile.setFilename(image.c_str());
+    product.bufferFile.open(BufferFile::READ);
+    if (!product.bufferFile.is_open()) throw Failure{image + ": cannot be read"};
 }
 
-Measurement Finder::find(const Target& target) {
-    const ROI_Obj& roi = product_.roi.Roi;
-    const SamplingConstants_Obj& sampling = product_.samplingConstants;
+Measurement find(GeneralSAR& product, const Target& target) {
+    const ROI_Obj& roi = product.roi.Roi;
+    const SamplingConstants_Obj& sampling = product.samplingConstants;
     double place[3], located[3];
     geodetic_to_xyz(&target.place, QUO_WGS84_EQUATORIAL_M, QUO_WGS84_POLAR_M, place);
     double azimuth_s = 0.0, range_s = 0.0, doppler_hz = 0.0;
-    require(product_.orbit.earth2sat(place, &azimuth_s, &range_s), target.name + " is not seen");
-    require(product_.polynomials.EvaluateDC(range_s, azimuth_s, &doppler_hz), "the Doppler centroid");
+    require(product.orbit.earth2sat(place, &azimuth_s, &range_s), target.name + " is not seen");
+    require(product.polynomials.EvaluateDC(range_s, azimuth_s, &doppler_hz), "the Doppler centroid");
     const double line = (azimuth_s - roi.SlowStartTime) / roi.SlowTimeDelta;
     const double sample = (range_s - roi.FastStartTime) / roi.FastTimeDelta;
     const int middle_line = static_cast<int>(std::lround(line));
     const int middle_sample = static_cast<int>(std::lround(sample));
-    const Chip chip{product_.bufferFile, middle_line, middle_sample, doppler_hz * roi.SlowTimeDelta};
+    const Chip chip{product.bufferFile, middle_line, middle_sample, doppler_hz * roi.SlowTimeDelta};
 
     const auto [row, column] = chip.brightest();
     const auto amplitude = [&](int r, int c) { return std::sqrt(chip.power(r, c)); };
@@ -166,9 +157,9 @@ Measurement Finder::find(const Target& target) {
     found.name = target.name;
     found.azimuth = respond(along, peak_line - line, 0.886 * sampling.prf_hz / sampling.Baz_hz);
     found.range = respond(across, peak_sample - sample, 0.886 * sampling.frg_hz / sampling.Brg_hz);
-    require(product_.orbit.sat2earth(roi.SlowStartTime + peak_line * roi.SlowTimeDelta,
-                                     roi.FastStartTime + peak_sample * roi.FastTimeDelta, 0.0,
-                                     target.place.height_m, located),
+    require(product.orbit.sat2earth(roi.SlowStartTime + peak_line * roi.SlowTimeDelta,
+                                    roi.FastStartTime + peak_sample * roi.FastTimeDelta, 0.0,
+                                    target.place.height_m, located),
             "a ground point");
     found.ground_m = norm(quo::load(located) - quo::load(place));
     found.strength_db = 20.0 * std::log10(top / target.strength);
@@ -181,19 +172,14 @@ Measurement Finder::find(const Target& target) {
     return found;
 }
 
-void print_response(std::FILE* out, const Response& response) {
-    std::fprintf(out, " %+7.3f %6.3f %+6.2f %7.2f %7.2f", response.shift, response.resolution,
-                 100.0 * (response.resolution / response.theory - 1.0), response.side_lobe_db,
-                 response.integrated_db);
-}
-
 }  // namespace
 
 std::vector<Measurement> measure(const std::string& image, const std::vector<Target>& targets) {
-    Finder finder{image};
+    GeneralSAR product;
+    open_image(image, product);
     std::vector<Measurement> found;
     found.reserve(targets.size());
-    for (const Target& target : targets) found.push_back(finder.find(target));
+    for (const Target& target : targets) found.push_back(find(product, target));
     return found;
 }
 
@@ -202,10 +188,10 @@ void print_table(std::FILE* out, const std::vector<Measurement>& measurements) {
     std::fprintf(out, "%-10s|%8s%7s%7s%8s%7s |%8s%7s%7s%8s%7s | %8s %8s %8s\n", "target", "shift", "width", "%",
                  "PSLR", "ISLR", "shift", "width", "%", "PSLR", "ISLR", "ground m", "phase", "ampl. dB");
     for (const Measurement& measurement : measurements) {
-        std::fprintf(out, "%-10s|", measurement.name.c_str());
-        print_response(out, measurement.azimuth);
-        std::fprintf(out, "|");
-        print_response(out, measurement.range);
+        std::fprintf(out, "%-10s", measurement.name.c_str());
+        for (const Response& r : {measurement.azimuth, measurement.range})
+            std::fprintf(out, "| %+7.3f %6.3f %+6.2f %7.2f %7.2f", r.shift, r.resolution,
+                         100.0 * (r.resolution / r.theory - 1.0), r.side_lobe_db, r.integrated_db);
         std::fprintf(out, "| %8.3f %+8.4f %+8.3f\n", measurement.ground_m, measurement.phase_rad,
                      measurement.strength_db);
     }
