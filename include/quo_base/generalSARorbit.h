@@ -17,7 +17,7 @@
  * values of each vector in turn. Times are azimuth times in seconds on the library's absolute scale (seconds since
  * 1985). `range` is always the two-way range time in seconds. Doppler is in Hz, positive while the platform
  * approaches the target. Angles are in degrees, latitude is geodetic (WGS84, semi-axes 6378137.0 m and
- * 6356752.314245 m). Ground points of the forward direction lie on the ellipsoid itself.
+ * 6356752.314245 m). Ground points of the forward direction lie on the ellipsoid itself, unless a height is given.
  *
  * Results are 0 for success unless said otherwise; outputs are then written, and otherwise stay as they were.
  * Whatever needs a model returns 1 while there is none (no state vectors, or computeApproximateSV() has not yet
@@ -302,6 +302,9 @@ public:
     /** The whole geometry of a sample, with the bits that the calls below give. `geometry` is unchanged on
      * failure. */
     int SVGetGeometry(double t, double range, double doppler, GrPtGeometry* geometry) noexcept;
+    /** The same at a geodetic height, m: of the point that sat2earth() finds there, with the normal of its place
+     * for the incidence angle. Height 0 gives the bits of the form above. */
+    int SVGetGeometry(double t, double range, double doppler, double height, GrPtGeometry* geometry) noexcept;
     /** Geodetic latitude, and longitude from -180 to 180. */
     int SVGetLatLon(double t, double range, double doppler, double* latitude, double* longitude) noexcept;
     int SVGetLatLon(double t, double range, double* latitude, double* longitude) noexcept;
@@ -408,7 +411,7 @@ private:
     int sampleAt(quo::CallerFrame frame, double t, double range, double doppler,
                  quo::OrbitSample* sample) noexcept;
     template <typename Read>
-    int readSample(const char* getter, bool writable, double t, double range, double doppler,
+    int readSample(const char* getter, bool writable, double t, double range, double doppler, double height,
                    const Read& read) noexcept;
     int locate(quo::CallerFrame frame, const double xyz[3], double doppler, bool precise, double* t,
                double* rangeTime) noexcept;

@@ -9,8 +9,10 @@
 
 namespace quo {
 
-/** One image sample: where the platform is on its run's curve, and the ground point it sees. */
+/** One image sample: at which height its ground point is wanted, where the platform is on its run's curve, and the
+ * point it sees. */
 struct OrbitSample {
+    double height_m;
     OrbitSegment curve;
     double since_run_start_s;
     Vec3 position, velocity, point;
@@ -110,17 +112,20 @@ int Obj::sampleAt(quo::CallerFrame frame, double t, double range, double doppler
                   quo::OrbitSample* sample) noexcept {
     if (const int status = platformAt(frame, t, sample)) return status;
     const quo::RadarLook look{range, doppler, lambda_, static_cast<double>(look_sign_)};
-    const int status = ground_point(sample->position, sample->velocity, look, quo::kWgs84, &sample->point);
+    const int status = sample->height_m == 0.0
+                           ? ground_point(sample->position, sample->velocity, look, quo::kWgs84, &sample->point)
+                           : ground_point_at_height(sample->position, sample->velocity, look, 0.0,
+                                                    sample->height_m, quo::kWgs84, &sample->point);
     return status ? frame.callee(status) : QUO_OK;
 }
 
 /** Solves a sample under the getter's own name, and lets `read` take from it what was asked for. */
 template <typename Read>
-int Obj::readSample(const char* getter, bool writable, double t, double range, double doppler,
+int Obj::readSample(const char* getter, bool writable, double t, double range, double doppler, double height,
                     const Read& read) noexcept {
     quo::CallFrame frame{getter, kSource};
     if (!writable) return frame.fail(QUO_REFUSED, kBadArgument);
-    quo::OrbitSample sample;
+    quo::OrbitSample sample{.height_m = height};
     if (const int status = sampleAt(frame, t, range, doppler, &sample)) return status;
     read(sample);
     return frame.success();
@@ -142,21 +147,12 @@ int Obj::sat2earth(const double pos[3], const double vel[3], double range, doubl
 int Obj::sat2earth(double t, double range, double* xyz) noexcept { return sat2earth(t, range, 0.0, xyz); }
 
 int Obj::sat2earth(double t, double range, double doppler, double* xyz) noexcept {
-    return readSample("GeneralSAROrbit::sat2earth", xyz, t, range, doppler,
-                      [xyz](const quo::OrbitSample& sample) { quo::store(sample.point, xyz); });
+    return sat2earth(t, range, doppler, 0.0, xyz);
 }
 
 int Obj::sat2earth(double t, double range, double doppler, double height, double* xyz) noexcept {
-    quo::CallFrame frame{"GeneralSAROrbit::sat2earth", kSource};
-    if (!xyz) return frame.fail(QUO_REFUSED, kBadArgument);
-    quo::OrbitSample sample;
-    if (const int status = platformAt(frame, t, &sample)) return status;
-    const quo::RadarLook look{range, doppler, lambda_, static_cast<double>(look_sign_)};
-    if (const int status = ground_point_at_height(sample.position, sample.velocity, look, 0.0, height, quo::kWgs84,
-                                                  &sample.point))
-        return frame.callee(status);
-    quo::store(sample.point, xyz);
-    return frame.success();
+    return readSample("GeneralSAROrbit::sat2earth", xyz, t, range, doppler, height,
+                      [xyz](const quo::OrbitSample& sample) { quo::store(sample.point, xyz); });
 }
 
 double* Obj::sat2earth(const double pos[3], const double vel[3], double range) noexcept {
@@ -193,7 +189,7 @@ double Obj::sat2earthZ(double t, double range, double doppler) noexcept {
 int Obj::sat2earthSquinted(double t, double range, double squint, double* xyz, double* time) noexcept {
     quo::CallFrame frame{"GeneralSAROrbit::sat2earthSquinted", kSource};
     if (!xyz || !time || !std::isfinite(squint)) return frame.fail(QUO_REFUSED, kBadArgument);
-    quo::OrbitSample sample;
+    quo::OrbitSample sample{.height_m = 0.0};
     if (const int status = sampleAt(frame, t, range, 0.0, &sample)) return status;
 
     const quo::Vec3 line = sample.point - sample.position;
@@ -280,16 +276,21 @@ double Obj::earth2satAzimuth(double x, double y, double z) noexcept {
 // --- geometry of a sample ---------------------------------------------------------------------------------------
 
 int Obj::SVGetGeometry(double t, double range, double doppler, GrPtGeometry* geometry) noexcept {
-    return readSample(
-        "GeneralSAROrbit::SVGetGeometry", geometry, t, range, doppler, [&](const quo::OrbitSample& sample) {
-            *geometry = quo::sample_geometry(sample.state(), sample.point, lambda_, 0.0, quo::kWgs84);
-        });
+    return SVGetGeometry(t, range, doppler, 0.0, geometry);
+}
+
+int Obj::SVGetGeometry(double t, double range, double doppler, double height, GrPtGeometry* geometry) noexcept {
+    return readSample("GeneralSAROrbit::SVGetGeometry", geometry, t, range, doppler, height,
+                      [&](const quo::OrbitSample& sample) {
+                          *geometry = quo::sample_geometry(sample.state(), sample.point, height, lambda_, 0.0,
+                                                           quo::kWgs84);
+                      });
 }
 
 // A single part costs a fraction of the whole: each getter works out its own alone.
 
 int Obj::SVGetLatLon(double t, double range, double doppler, double* latitude, double* longitude) noexcept {
-    return readSample("GeneralSAROrbit::SVGetLatLon", latitude && longitude, t, range, doppler,
+    return readSample("GeneralSAROrbit::SVGetLatLon", latitude && longitude, t, range, doppler, 0.0,
                       [&](const quo::OrbitSample& sample) {
                           const GeodeticPoint place = to_geodetic(sample.point, quo::kWgs84);
                           *latitude = place.latitude_deg;
@@ -298,7 +299,7 @@ int Obj::SVGetLatLon(double t, double range, double doppler, double* latitude, d
 }
 
 int Obj::SVGetAngles(double t, double range, double doppler, double* incidence, double* look) noexcept {
-    return readSample("GeneralSAROrbit::SVGetAngles", incidence && look, t, range, doppler,
+    return readSample("GeneralSAROrbit::SVGetAngles", incidence && look, t, range, doppler, 0.0,
                       [&](const quo::OrbitSample& sample) {
                           *incidence = quo::incidence_deg(sample.position, sample.point, quo::kWgs84);
                           *look = quo::look_angle_deg(sample.position, sample.point);
@@ -306,13 +307,14 @@ int Obj::SVGetAngles(double t, double range, double doppler, double* incidence, 
 }
 
 int Obj::SVGetFR(double t, double range, double doppler, double* rate) noexcept {
-    return readSample("GeneralSAROrbit::SVGetFR", rate, t, range, doppler, [&](const quo::OrbitSample& sample) {
-        *rate = quo::fm_rate_hz_s(sample.state(), sample.point, lambda_, 0.0);
-    });
+    return readSample("GeneralSAROrbit::SVGetFR", rate, t, range, doppler, 0.0,
+                      [&](const quo::OrbitSample& sample) {
+                          *rate = quo::fm_rate_hz_s(sample.state(), sample.point, lambda_, 0.0);
+                      });
 }
 
 int Obj::SVGetSatSpeed(double t, double range, double doppler, double* speed) noexcept {
-    return readSample("GeneralSAROrbit::SVGetSatSpeed", speed, t, range, doppler,
+    return readSample("GeneralSAROrbit::SVGetSatSpeed", speed, t, range, doppler, 0.0,
                       [&](const quo::OrbitSample& sample) { *speed = norm(sample.velocity); });
 }
 
