@@ -200,7 +200,7 @@ TEST(Arrays, HaveTheSameBitsInPacksOfEveryWidth) {
         std::ranges::copy(made.doppler, inverse[i].doppler_hz);
         kernels.inverse(view, quo::kBlockPoints, inverse[i]);
     }
-    EXPECT_GT(std::ranges::count_if(inverse[0].solved, [](auto solved) { return solved != 0; }), 80);
+    EXPECT_GT(std::ranges::count_if(inverse[0].solved, [](auto solved) { return solved != 0; }), 40);
     for (int i = 1; i < 3; ++i)
         for (int j = 0; j < quo::kBlockPoints; ++j) {
             ASSERT_EQ(forward[i].solved[j], forward[0].solved[j]) << j;

@@ -88,11 +88,16 @@ void each_piece(std::size_t count, const Body& body) noexcept {
         body(Piece{at, static_cast<int>(std::min<std::size_t>(quo::kBlockPoints, count - at))});
 }
 
-/** Calls `solve` for the points that the kernel has left, and collects what every point's call returns. */
+/** Calls `solve` for the points that a kernel has left, and tells what every point's call returns. */
 template <typename Solve>
-void solve_rest(const Piece& piece, const std::int64_t* solved, std::int32_t* status,
+void solve_rest(const Piece& piece, bool all_solved, const std::int64_t* solved, std::int32_t* to,
                 const Solve& solve) noexcept {
-    for (int i = 0; i < piece.count; ++i) status[i] = solved[i] != 0 ? static_cast<int>(QUO_OK) : solve(i);
+    if (all_solved && !to) return;
+    std::int32_t status[quo::kBlockPoints] = {};
+    if (!all_solved)
+        for (int i = 0; i < piece.count; ++i)
+            if (solved[i] == 0) status[i] = solve(i);
+    piece.write(status, to);
 }
 
 // --- Forward ----------------------------------------------------------------------------------------------------
@@ -196,15 +201,14 @@ int Obj::sat2earth(const OrbitSamples& samples, const OrbitGround& ground) const
     block.want_rate = ground.fm_rate_hz_s;
     block.want_speed = ground.speed_m_s;
     each_piece(samples.count, [&](const Piece& piece) {
-        std::int32_t status[quo::kBlockPoints];
         piece.read(samples.azimuth_s, block.t_s);
         piece.read(samples.range_s, block.range_s);
         piece.read(samples.doppler_hz, block.doppler_hz);
         piece.read(samples.height_m, block.height_m);
-        kernels.forward(view, piece.count, block);
-        solve_rest(piece, block.solved, status, [&](int i) { return solve_sample(model, view, block, i); });
+        const bool all = kernels.forward(view, piece.count, block);
+        solve_rest(piece, all, block.solved, ground.status,
+                   [&](int i) { return solve_sample(model, view, block, i); });
         for (const auto& [array, row] : kGroundArrays) piece.write(block.result[row], ground.*array);
-        piece.write(status, ground.status);
     });
     return frame.success();
 }
@@ -226,14 +230,13 @@ int Obj::earth2sat(const OrbitTargets& targets, const OrbitSightings& seen) cons
     quo::InverseBlock block;
     if (!guessable) std::ranges::fill(block.solved, 0);
     each_piece(targets.count, [&](const Piece& piece) {
-        std::int32_t status[quo::kBlockPoints];
         read_points(piece, targets, form, block);
         piece.read(targets.doppler_hz, block.doppler_hz);
-        if (guessable) kernels.inverse(view, piece.count, block);
-        solve_rest(piece, block.solved, status, [&](int i) { return solve_target(model, view, block, i); });
+        const bool all = guessable && kernels.inverse(view, piece.count, block);
+        solve_rest(piece, all, block.solved, seen.status,
+                   [&](int i) { return solve_target(model, view, block, i); });
         piece.write(block.t_s, seen.azimuth_s);
         piece.write(block.range_s, seen.range_s);
-        piece.write(status, seen.status);
     });
     return frame.success();
 }

@@ -25,7 +25,7 @@ struct OrbitView {
 };
 
 /** Points of a block, a multiple of every pack's width. Inputs are filled up to that with any of the points. */
-inline constexpr int kBlockPoints = 128;
+inline constexpr int kBlockPoints = 64;
 using BlockNumbers = double[kBlockPoints];
 
 /** What is known of a ground point: the rows of a block's results. */
@@ -48,11 +48,12 @@ struct InverseBlock {
     alignas(64) std::int64_t solved[kBlockPoints];
 };
 
-/** The kernels for one width of pack. `count` is the number of points, at most kBlockPoints. */
+/** The kernels for one width of pack. `count` is the number of points, at most kBlockPoints. True where all of
+ * them are solved. */
 struct ArrayKernels {
     int width;
-    void (*forward)(const OrbitView& orbit, int count, ForwardBlock& block) noexcept;
-    void (*inverse)(const OrbitView& orbit, int count, InverseBlock& block) noexcept;
+    bool (*forward)(const OrbitView& orbit, int count, ForwardBlock& block) noexcept;
+    bool (*inverse)(const OrbitView& orbit, int count, InverseBlock& block) noexcept;
 };
 
 /** The widest kernels for at most so many lanes that were built and that this processor runs. */

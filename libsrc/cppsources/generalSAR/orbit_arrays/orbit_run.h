@@ -84,9 +84,9 @@ QUO_LANES_INLINE T choose_run(const RunTimes& times, T from_start_s, T t) noexce
     // Some numbers beyond the ends, so that rounding up and down have a whole number's room.
     const T lowest = fill<T>(-8.0), highest = fill<T>(last + 8.0);
     const T u = t - times.first_s;
-    const T ending = rounded_up(clamped((u + edge) / times.spacing_s, lowest, highest)) - 4.0;
-    const T starting = rounded_down(clamped((u - edge) / times.spacing_s, lowest, highest));
-    T k = select(magnitude(t - from_start_s) < edge, ending, starting);
+    T k = rounded_down(clamped((u - edge) / times.spacing_s, lowest, highest));
+    const MaskOf<T> early = magnitude(t - from_start_s) < edge;
+    if (any(early)) k = select(early, rounded_up(clamped((u + edge) / times.spacing_s, lowest, highest)) - 4.0, k);
     k = select(u >= 0.0, k, T{});
     k = select(u > (last + (kRunVectors - 1)) * times.spacing_s, fill<T>(last), k);
     return clamped(k, T{}, fill<T>(last));

@@ -178,7 +178,8 @@ QUO_LANES_INLINE MaskOf<NumberOf<V>> fill_look_circle(const V& S, const V& veloc
     constexpr double kSteepest2 =
         1e-18;  // squared cosine of the flight path's slope that still tells left from right
     const MaskOf<T> good = both(radius2 > 0.0, upright2 > kSteepest2 * dot(S, S));
-    if (!any(good)) return good;
+    if constexpr (kLanes<T> == 1)
+        if (!good) return good;
 
     const T scale = root(radius2 / upright2);
     const T sideways = (look.side < 0.0 ? -scale : scale) / root(V2);
@@ -194,33 +195,41 @@ QUO_LANES_INLINE MaskOf<NumberOf<V>> fill_look_circle(const V& S, const V& veloc
     return good;
 }
 
-/** Newton's method from the crossing with the sphere through the point beneath the platform. False where it fails
- * to settle on a crossing outwards, on the look side: near the nadir. Lanes that are not asked for stay false. */
+/** Newton's method on a look circle. What is open is not yet done, what is found has settled on a crossing
+ * outwards, on the look side; near the nadir it may fail to. */
+template <class T>
+struct CrossingOf {
+    CirclePointOf<T> at;
+    MaskOf<T> open, found;
+};
+
+/** The crossing with the sphere through the point beneath the platform, where `asked` holds, to begin with. */
 template <class V, class E>
-QUO_LANES_INLINE MaskOf<NumberOf<V>> find_crossing(const LookCircleOf<V>& circle, const V& S, const E& e,
-                                                   MaskOf<NumberOf<V>> asked,
-                                                   CirclePointOf<NumberOf<V>>* at) noexcept {
+QUO_LANES_INLINE CrossingOf<NumberOf<V>> begin_crossing(const LookCircleOf<V>& circle, const V& S, const E& e,
+                                                        MaskOf<NumberOf<V>> asked) noexcept {
     using T = NumberOf<V>;
-    // Within a centimetre Newton's next step reaches rounding; touch_down() takes it at the point itself.
-    constexpr double kClose2 = 1e-4;  // m^2
     // |S|^2 less the squared radius of the ellipsoid in that direction, by way of |S|^2 / (a times the gradient).
     const auto a2 = e.equatorial_m * e.equatorial_m;
     const T nadir2 = a2 * dot(S, S) / dot(S, ellipsoid_gradient(S, e));
     const T first = (circle.base_m2 + a2 - nadir2) / -circle.swing_m2;
-    MaskOf<T> open = both(asked, magnitude(first) < 1.0), found = but_not(open, open);
-    if (!any(open)) return found;
-    CirclePointOf<T> p{first, root(1.0 - first * first)};
-    for (int step = 0; step < kForwardSteps && any(open); ++step) {
-        const auto level = circle.level(p.c, p.s);
-        const T turn = -level.value / level.slope;
-        const CirclePointOf<T> next = p.turned(0.5 * turn);
-        p = {select(open, next.c, p.c), select(open, next.s, p.s)};
-        const MaskOf<T> settled = both(open, turn * turn * circle.radius2_m2 <= kClose2);
-        found = either(found, both(settled, both(p.s > 0.0, level.slope > 0.0)));
-        open = but_not(open, settled);
-    }
-    *at = p;
-    return found;
+    const MaskOf<T> crosses = both(asked, magnitude(first) < 1.0);
+    const T c = select(crosses, first, T{});
+    return {{c, root(1.0 - c * c)}, crosses, but_not(asked, asked)};
+}
+
+template <class V>
+QUO_LANES_INLINE void step_crossing(const LookCircleOf<V>& circle, CrossingOf<NumberOf<V>>& crossing) noexcept {
+    using T = NumberOf<V>;
+    // Within a centimetre Newton's next step reaches rounding; touch_down() takes it at the point itself.
+    constexpr double kClose2 = 1e-4;  // m^2
+    auto& [p, open, found] = crossing;
+    const auto level = circle.level(p.c, p.s);
+    const T turn = -level.value / level.slope;
+    const CirclePointOf<T> next = p.turned(0.5 * turn);
+    p = {select(open, next.c, p.c), select(open, next.s, p.s)};
+    const MaskOf<T> settled = both(open, turn * turn * circle.radius2_m2 <= kClose2);
+    found = either(found, both(settled, both(p.s > 0.0, level.slope > 0.0)));
+    open = but_not(open, settled);
 }
 
 /** The ground point near a place on the circle. False where it lies beneath the platform's horizon.
@@ -287,35 +296,39 @@ struct ImageTimeOf {
     MaskOf<T> settled, seen;
 };
 
-/** Time at which P is seen with a range rate, by Newton's method from `start_s`, and the range time before the
- * last step. Not seen where an iterate but the last leaves the span or anything is not a number, and where `asked`
- * does not hold. Running out of steps is told by `settled` alone. */
-template <class V>
-QUO_LANES_INLINE ImageTimeOf<NumberOf<V>> find_image_time(const SegmentOf<NumberOf<V>>& orbit, const V& P,
-                                                          NumberOf<V> start_s, const TimeSpanOf<NumberOf<V>>& span,
-                                                          NumberOf<V> range_rate_m_s,
-                                                          MaskOf<NumberOf<V>> asked) noexcept {
-    using T = NumberOf<V>;
-    T t = start_s, range2{}, slope{};
-    MaskOf<T> open = asked, seen = asked, settled = but_not(asked, asked);
-    for (int step = 0; step < kInverseSteps && any(open); ++step) {
-        const MaskOf<T> inside = both(t >= span.first_s, t <= span.last_s);
+/** Newton's method in time: what is open is not yet done, what was seen has stayed in the span so far. */
+template <class T>
+struct TimeSearchOf {
+    T t_s, range2_m2, slope;
+    MaskOf<T> open, seen, settled;
+
+    /** From a start, where `asked` holds. */
+    QUO_LANES_INLINE static TimeSearchOf begin(T start_s, MaskOf<T> asked) noexcept {
+        return {start_s, T{}, T{}, asked, asked, but_not(asked, asked)};
+    }
+    template <class V>
+    QUO_LANES_INLINE void step(const SegmentOf<T>& orbit, const V& P, const TimeSpanOf<T>& span,
+                               T range_rate_m_s) noexcept {
+        const MaskOf<T> inside = both(t_s >= span.first_s, t_s <= span.last_s);
         seen = but_not(seen, but_not(open, inside));
         open = both(open, inside);
-        if (!any(open)) break;
-        const DopplerResidualOf<T> at = doppler_residual(orbit_state(orbit, t), P, range_rate_m_s);
+        if constexpr (kLanes<T> == 1)
+            if (!open) return;
+        const DopplerResidualOf<T> at = doppler_residual(orbit_state(orbit, t_s), P, range_rate_m_s);
         const T change = at.value / at.slope;
-        t = select(open, t - change, t);
-        range2 = select(open, at.range2_m2, range2);
+        t_s = select(open, t_s - change, t_s);
+        range2_m2 = select(open, at.range2_m2, range2_m2);
         slope = select(open, at.slope, slope);
         const MaskOf<T> close = both(open, magnitude(change) < kInverseStep);
         settled = either(settled, close);
         open = but_not(open, close);
     }
-    // A Doppler so large that the slope overflows makes a step of 0, which settles nothing.
-    seen = both(seen, both(magnitude(t) <= kMost, magnitude(slope) <= kMost));
-    return {t, 2.0 / kLightSpeed * root(range2), settled, seen};
-}
+    [[nodiscard]] QUO_LANES_INLINE ImageTimeOf<T> end() const noexcept {
+        // A Doppler so large that the slope overflows makes a step of 0, which settles nothing.
+        const MaskOf<T> known = both(magnitude(t_s) <= kMost, magnitude(slope) <= kMost);
+        return {t_s, 2.0 / kLightSpeed * root(range2_m2), settled, both(seen, known)};
+    }
+};
 
 // --- Geometry at a sample ---------------------------------------------------------------------------------------
 

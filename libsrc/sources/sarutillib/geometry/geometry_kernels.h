@@ -36,11 +36,12 @@ inline int ground_point(const Vec3& S, const Vec3& V, const RadarLook& look, con
                         Vec3* P) noexcept {
     if (!usable_look(S, V, look, e)) return QUO_REFUSED;
     LookCircle circle;
-    CirclePoint at;
     Vec3 p;
     if (!fill_look_circle(S, V, look, e, &circle)) return QUO_NUMERIC;
-    if (!find_crossing(circle, S, e, true, &at) && !search_crossing(circle, &at)) return QUO_NUMERIC;
-    if (!touch_down(circle, S, e, at, &p)) return QUO_NUMERIC;
+    CrossingOf<double> crossing = begin_crossing(circle, S, e, true);
+    for (int step = 0; step < kForwardSteps && crossing.open; ++step) step_crossing(circle, crossing);
+    if (!crossing.found && !search_crossing(circle, &crossing.at)) return QUO_NUMERIC;
+    if (!touch_down(circle, S, e, crossing.at, &p)) return QUO_NUMERIC;
     *P = p;
     return QUO_OK;
 }
@@ -78,13 +79,18 @@ using TimeSpan = TimeSpanOf<double>;
 using DopplerResidual = DopplerResidualOf<double>;
 using ImageTime = ImageTimeOf<double>;
 
-/** As find_image_time(), for a Doppler. 12 where the point is not seen.
+/** Time at which P is seen with a Doppler, by Newton's method from `start_s`, and the range time before the last
+ * step. 12 where an iterate but the last leaves the span or anything is not a number. Running out of steps is told
+ * in the result alone.
  *
  * Targets seen close to either end need room beyond it: from the middle of a segment of 10 s spacing the first
  * iterate lands up to 0.1 s beside a solution at the end, at 60 s spacing up to 3 s. */
 inline int image_time(const OrbitSegment& orbit, const Vec3& P, double start_s, const TimeSpan& span,
                       double lambda_m, double fd_hz, ImageTime* seen) noexcept {
-    const ImageTime found = find_image_time(orbit, P, start_s, span, 0.5 * lambda_m * fd_hz, true);
+    auto search = TimeSearchOf<double>::begin(start_s, true);
+    for (int step = 0; step < kInverseSteps && search.open; ++step)
+        search.step(orbit, P, span, 0.5 * lambda_m * fd_hz);
+    const ImageTime found = search.end();
     if (!found.seen) return QUO_NOT_SEEN;
     *seen = found;
     return QUO_OK;
