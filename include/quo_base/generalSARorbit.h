@@ -1,6 +1,7 @@
 #ifndef QUO_BASE_GENERALSARORBIT_H
 #define QUO_BASE_GENERALSARORBIT_H
 
+#include <cstddef>
 #include <cstdint>
 #include <memory>
 #include <vector>
@@ -17,7 +18,7 @@
  * values of each vector in turn. Times are azimuth times in seconds on the library's absolute scale (seconds since
  * 1985). `range` is always the two-way range time in seconds. Doppler is in Hz, positive while the platform
  * approaches the target. Angles are in degrees, latitude is geodetic (WGS84, semi-axes 6378137.0 m and
- * 6356752.314245 m). Ground points of the forward direction lie on the ellipsoid itself.
+ * 6356752.314245 m). Ground points of the forward direction lie on the ellipsoid itself, unless a height is given.
  *
  * Results are 0 for success unless said otherwise; outputs are then written, and otherwise stay as they were.
  * Whatever needs a model returns 1 while there is none (no state vectors, or computeApproximateSV() has not yet
@@ -116,6 +117,38 @@ struct SVFinding {
     std::int32_t index;  ///< number of the vector, from 0; -1 for the list as a whole
     double size;         ///< how far it is off, as told by the problem
     char text[120];      ///< the finding in words
+};
+
+/** Image samples for GeneralSAROrbit::sat2earth(): arrays of `count` numbers each. */
+struct OrbitSamples {
+    std::size_t count;           ///< of the samples, and so of every array
+    const double* azimuth_s;     ///< azimuth times
+    const double* range_s;       ///< two-way range times
+    const double* doppler_hz{};  ///< null for Doppler 0
+    const double* height_m{};    ///< heights of the ground points above the ellipsoid; null for 0
+};
+/** What is wanted of the samples' ground points: arrays for as many numbers, null where one is not wanted. A
+ * sample without a ground point gets not-a-number in all of them. Quantities as in GrPtGeometry. */
+struct OrbitGround {
+    double *latitude_deg{}, *longitude_deg{}, *height_m{};  ///< geodetic place
+    double *x_m{}, *y_m{}, *z_m{};                          ///< the same, Earth-fixed
+    double *incidence_deg{}, *look_deg{};                   ///< angles at the target and at the platform
+    double *fm_rate_hz_s{}, *speed_m_s{};                   ///< azimuth FM rate, platform speed
+    std::int32_t* status{};                                 ///< what the call for the one sample returns
+};
+/** Ground points for GeneralSAROrbit::earth2sat(): arrays of `count` numbers each, latitude and longitude or x, y
+ * and z. */
+struct OrbitTargets {
+    std::size_t count;                               ///< of the points, and so of every array
+    const double *latitude_deg{}, *longitude_deg{};  ///< geodetic
+    const double* height_m{};                        ///< above the ellipsoid; null for 0
+    const double *x_m{}, *y_m{}, *z_m{};             ///< Earth-fixed, in place of the three above
+    const double* doppler_hz{};                      ///< null for Doppler 0
+};
+/** What is wanted of them; null where it is not. A point that is not seen gets not-a-number. */
+struct OrbitSightings {
+    double *azimuth_s{}, *range_s{};  ///< azimuth time and two-way range time
+    std::int32_t* status{};           ///< what the call for the one point returns
 };
 
 /** The orbit model: a degree-4 polynomial through every run of five state vectors, and geolocation on it.
@@ -293,6 +326,26 @@ public:
     double earth2satAzimuth(const double xyz[3]) noexcept;
     double earth2satAzimuth(double x, double y, double z) noexcept;
 
+    // --- many points at once ---------------------------------------------------------------------
+    //
+    // Every point takes the run that the orbit takes for it when its model has just been made, whatever was asked
+    // before: it gets what the call for the one point then gives, the angles of a place within 1e-13 degrees and
+    // everything else to the bit. So results hang neither on the length of the arrays nor on what stands beside a
+    // point, and arrays may be cut into pieces at will. Nothing in the orbit changes: calls on one orbit may run
+    // side by side on any number of threads, as long as nobody calls anything else of it that is not const.
+    //
+    // An output may be the very array of an input, but must not overlap with one otherwise, nor with another
+    // output. Points without a solution are told by their status, not in the report.
+
+    /** Ground points of samples.
+     * @return 0, also where samples have none; 1 without a model, for a missing array of azimuth or range times,
+     * for arrays that overlap or that no memory can hold. Nothing is written then. */
+    int sat2earth(const OrbitSamples& samples, const OrbitGround& ground) const noexcept;
+    /** When ground points are seen.
+     * @return 0, also where points are not; 1 without a model, for points that are not given in exactly one of the
+     * two forms, for arrays that overlap or that no memory can hold. Nothing is written then. */
+    int earth2sat(const OrbitTargets& targets, const OrbitSightings& seen) const noexcept;
+
     // --- geometry of a sample --------------------------------------------------------------------
     //
     // Of the ground point that sat2earth() finds. The short forms return not-a-number after a failure. All of it
@@ -302,6 +355,9 @@ public:
     /** The whole geometry of a sample, with the bits that the calls below give. `geometry` is unchanged on
      * failure. */
     int SVGetGeometry(double t, double range, double doppler, GrPtGeometry* geometry) noexcept;
+    /** The same at a geodetic height, m: of the point that sat2earth() finds there, with the normal of its place
+     * for the incidence angle. Height 0 gives the bits of the form above. */
+    int SVGetGeometry(double t, double range, double doppler, double height, GrPtGeometry* geometry) noexcept;
     /** Geodetic latitude, and longitude from -180 to 180. */
     int SVGetLatLon(double t, double range, double doppler, double* latitude, double* longitude) noexcept;
     int SVGetLatLon(double t, double range, double* latitude, double* longitude) noexcept;
@@ -408,7 +464,7 @@ private:
     int sampleAt(quo::CallerFrame frame, double t, double range, double doppler,
                  quo::OrbitSample* sample) noexcept;
     template <typename Read>
-    int readSample(const char* getter, bool writable, double t, double range, double doppler,
+    int readSample(const char* getter, bool writable, double t, double range, double doppler, double height,
                    const Read& read) noexcept;
     int locate(quo::CallerFrame frame, const double xyz[3], double doppler, bool precise, double* t,
                double* rangeTime) noexcept;

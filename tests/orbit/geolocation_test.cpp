@@ -178,6 +178,10 @@ constexpr Call kCalls[] = {
      [](auto& o, auto* in, auto* p) {
          return o.SVGetGeometry(in[0], in[1], in[2], reinterpret_cast<GrPtGeometry*>(p));
      }},
+    {"SVGetGeometry with height", 4,
+     [](auto& o, auto* in, auto* p) {
+         return o.SVGetGeometry(in[0], in[1], in[2], in[3], reinterpret_cast<GrPtGeometry*>(p));
+     }},
     {"linear", 4, [](auto& o, auto* in, auto* out) { return o.earth2satLinear(in, out, out + 1, in[3]); }},
     {"earth2sat", 4, [](auto& o, auto* in, auto* out) { return o.earth2sat(in, out, out + 1, in[3]); }},
     {"earth2satPrecise", 4, [](auto& o, auto* in, auto* p) { return o.earth2satPrecise(in, p, p + 1, in[3]); }},
@@ -193,7 +197,7 @@ TEST(EveryCall, RefusesWhatIsNotFiniteAndWhatHasNoModel) {
     for (const Call& call : kCalls) {
         SCOPED_TRACE(call.name);
         const bool search = std::string_view{call.name}.starts_with("earth2sat"),
-                   linear = call.run == kCalls[7].run;
+                   linear = call.run == kCalls[8].run;
         double in[] = {kTimes.first_s + 70.0, 5.4e-3, 0.3, 17.3}, out[9] = {};
         if (search || linear) std::copy_n(target.v, 3, in);
         EXPECT_EQ(call.run(flight.orbit, in, out), 0);
@@ -254,7 +258,7 @@ TEST(EveryCall, SaysTheSameInAllItsForms) {
     std::vector<double> all(9);
     for (const double fd : {1234.5, 0.0}) {
         all.resize(9);
-        ASSERT_EQ(o.SVGetGeometry(t, range, fd, reinterpret_cast<GrPtGeometry*>(all.data())), 0);
+        ASSERT_EQ(o.SVGetGeometry(t, range, fd, 0.0, reinterpret_cast<GrPtGeometry*>(all.data())), 0);
         all.insert(all.end(), {all[0], all[1], all[2]});
         EXPECT_EQ(returned(o, t, range, fd), all);
         EXPECT_EQ(written(o, t, range, fd), all);
@@ -285,6 +289,12 @@ TEST(Sat2Earth, MeetsAHeightAndNamesTheGroundItCannotSee) {
         const test::Platform platform = flight.state(kTimes.at(3));
         orbit.setLookSign(height < 0.0 ? -1 : 1);
         ASSERT_EQ(orbit.sat2earth(kTimes.at(3), 5.4e-3, 812.5, height, p.v), 0);
+        GrPtGeometry at;
+        ASSERT_EQ(orbit.SVGetGeometry(kTimes.at(3), 5.4e-3, 812.5, height, &at), 0);
+        EXPECT_TRUE(std::equal(p.v, p.v + 3, at.point_m));
+        EXPECT_NEAR(
+            at.incidence_deg,
+            test::angle_deg(test::local_frame(at.latitude_deg, at.longitude_deg).up, platform.position - p), 1e-9);
         EXPECT_NEAR(test::height_above_ellipsoid(p), height, 1e-6);
         EXPECT_NEAR(doppler_of(platform, p, orbit.getLambda()), 812.5, 1e-2);
         EXPECT_NEAR(test::norm(p - platform.position), 2.7e-3 * test::kLightSpeed, 1e-4);

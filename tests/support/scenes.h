@@ -23,7 +23,6 @@ struct Scene {
     double range_reach_m;  ///< and slant ranges within this
     double doppler_hz;     ///< a Doppler that the platform can have, for tests off broadside
     bool geocentric;       ///< the mission's incidence is against the geocentric radius, not the normal
-    bool at_sea_level;     ///< every tie point lies on the ellipsoid
 
     [[nodiscard]] std::string path(const char* ending) const {
         return std::string{QUO_TEST_DATA} + "/scenes/" + file + ending;
@@ -32,9 +31,9 @@ struct Scene {
 inline std::ostream& operator<<(std::ostream& out, const Scene& scene) { return out << scene.name; }
 
 inline constexpr Scene kScenes[] = {
-    {"SatelliteAscendingRight", "s1a_iw1_slc_20220104_asc", 2.5e-6, 1e-5, 3000.0, true, false},
-    {"SatelliteDescendingRight", "s1a_iw_grd_20201127_desc_sea", 2.5e-6, 1e-5, 3000.0, true, true},
-    {"AirborneLeft", "uavsar_winnipeg_20120717_left", 2e-7, 1e-6, 300.0, false, false},
+    {"SatelliteAscendingRight", "s1a_iw1_slc_20220104_asc", 2.5e-6, 1e-5, 3000.0, true},
+    {"SatelliteDescendingRight", "s1a_iw_grd_20201127_desc_sea", 2.5e-6, 1e-5, 3000.0, true},
+    {"AirborneLeft", "uavsar_winnipeg_20120717_left", 2e-7, 1e-6, 300.0, false},
 };
 
 struct TiePoint {

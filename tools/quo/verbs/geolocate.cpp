@@ -1,5 +1,6 @@
 #include <algorithm>
 #include <array>
+#include <cmath>
 #include <limits>
 #include <optional>
 #include <span>
@@ -17,11 +18,11 @@ namespace {
 
 struct GeolocateOptions {
     std::string header, direction, input = "-", output = "-", look;
-    std::optional<double> wavelength_m, resample_s;
+    std::optional<double> wavelength_m, resample_s, height_m;
     bool precise = false, waitbar = false;
 };
 
-constexpr std::size_t kInputs = 4;  // at most, the Doppler included
+constexpr std::size_t kInputs = 3;  // at most
 constexpr std::size_t kOutputs = 9;
 
 /** A column that a direction reads, and the values that make sense in it. */
@@ -31,21 +32,27 @@ struct Input {
     double highest = std::numeric_limits<double>::max();
 };
 
-/** One way through the geometry: what it reads (the Doppler apart), what it adds, and how. */
+/** What a row may say beside its place; 0, or what the command line says, where the table has no such column. */
+struct Aside {
+    double doppler_hz = 0.0;
+    double height_m = 0.0;  // of the ground points that --to ground finds
+};
+
+/** One way through the geometry: what it must read, what it adds, and how. */
 struct Direction {
     std::span<const Input> inputs;
     std::span<const char* const> outputs;
-    int (*solve)(Scene& scene, const double* in, double doppler_hz, double* out);
+    int (*solve)(Scene& scene, const double* in, const Aside& aside, double* out);
 };
 
 constexpr Input kDoppler{"doppler_hz"}, kHeight{"height_m"};
 
-int to_ground(Scene& scene, const double* in, double doppler_hz, double* out) {
+int to_ground(Scene& scene, const double* in, const Aside& aside, double* out) {
     const double time_s = in[0];
     const double range_s = in[1];
     if (!scene.covers(time_s)) return QUO_NOT_SEEN;
     GrPtGeometry at{};
-    const int status = scene.orbit().SVGetGeometry(time_s, range_s, doppler_hz, &at);
+    const int status = scene.orbit().SVGetGeometry(time_s, range_s, aside.doppler_hz, aside.height_m, &at);
     const auto& [x, y, z] = at.point_m;
     const double values[] = {
         x, y, z, at.latitude_deg, at.longitude_deg, at.incidence_deg, at.look_deg, at.fm_rate_hz_s, at.speed_m_s};
@@ -58,11 +65,11 @@ using Inverse = int (GeneralSAROrbit::*)(const double*, double*, double*, double
 // The equations of range and Doppler know nothing of the Earth in between: a point near the antipode solves them
 // too.
 template <Inverse solve>
-int to_radar(Scene& scene, const double* in, double doppler_hz, double* out) {
+int to_radar(Scene& scene, const double* in, const Aside& aside, double* out) {
     const GeodeticPoint ground{in[0], in[1], in[2]};
     double point[3], platform[3];
     quo::store(quo::from_geodetic(ground), point);
-    int status = (scene.orbit().*solve)(point, out, out + 1, doppler_hz);
+    int status = (scene.orbit().*solve)(point, out, out + 1, aside.doppler_hz);
     if (status == 0) status = scene.orbit().SVGetPos(out[0], platform);
     if (status != 0) return status;
     const quo::Vec3 line = quo::load(platform) - quo::load(point);
@@ -82,26 +89,37 @@ constexpr Direction kToRadarPrecisely{kPoint, kTimes, to_radar<&GeneralSAROrbit:
 const Direction& direction_of(const GeolocateOptions& options) {
     if (options.direction == "ground") {
         if (options.precise) throw WrongUse("--precise belongs to --to radar");
+        if (options.height_m && !std::isfinite(*options.height_m))
+            throw WrongUse("a height of " + exact(*options.height_m) + " m");
         return kToGround;
     }
+    if (options.height_m) throw WrongUse("--height belongs to --to ground");
     return options.precise ? kToRadarPrecisely : kToRadar;
 }
 
 /** Where a direction finds its values in a row of the table. */
 class Columns {
 public:
-    Columns(const Table& table, const Direction& direction) : doppler_{table.find(kDoppler.name)} {
+    Columns(const Table& table, const GeolocateOptions& options, const Direction& direction)
+        : doppler_{table.find(kDoppler.name)} {
         for (const Input& input : direction.inputs) indices_.push_back(table.need(input.name));
+        if (&direction == &kToGround) height_ = table.find(kHeight.name);
+        if (height_ && options.height_m)
+            throw Failure(table.input().name() + ": there is a column " + kHeight.name + ", and --height");
+        unless_told_.height_m = options.height_m.value_or(0.0);
     }
     bool has_doppler() const { return doppler_.has_value(); }
 
     /** The row's values, or what is wrong with them. */
     std::optional<std::string> read(const Table& table, const Direction& direction, double* in,
-                                    double& doppler_hz) const {
+                                    Aside& aside) const {
         if (auto defect = table.defect()) return defect;
         for (std::size_t i = 0; i < indices_.size(); ++i)
             if (auto defect = read_one(table, direction.inputs[i], indices_[i], in[i])) return defect;
-        return doppler_ ? read_one(table, kDoppler, *doppler_, doppler_hz) : std::nullopt;
+        aside = unless_told_;
+        if (doppler_)
+            if (auto defect = read_one(table, kDoppler, *doppler_, aside.doppler_hz)) return defect;
+        return height_ ? read_one(table, kHeight, *height_, aside.height_m) : std::nullopt;
     }
 
 private:
@@ -118,7 +136,8 @@ private:
     }
 
     std::vector<std::size_t> indices_;
-    std::optional<std::size_t> doppler_;
+    std::optional<std::size_t> doppler_, height_;
+    Aside unless_told_;
 };
 
 /** A name for a computed column that no column of the table bears yet. */
@@ -151,9 +170,9 @@ std::optional<std::string> geolocate_row(Scene& scene, const Table& table, const
                                          const Columns& columns, std::string& line) {
     std::array<double, kInputs> in{};
     std::array<double, kOutputs> out{};
-    double doppler_hz = 0.0;
-    auto cause = columns.read(table, direction, in.data(), doppler_hz);
-    const int status = cause ? QUO_REFUSED : direction.solve(scene, in.data(), doppler_hz, out.data());
+    Aside aside;
+    auto cause = columns.read(table, direction, in.data(), aside);
+    const int status = cause ? QUO_REFUSED : direction.solve(scene, in.data(), aside, out.data());
     if (!cause && status != 0) cause = "status " + status_text(status);
 
     append_row(line, table);
@@ -165,17 +184,9 @@ std::optional<std::string> geolocate_row(Scene& scene, const Table& table, const
     return cause;
 }
 
-// Points are found at height 0: a height beside them would look like theirs.
-void refuse_heights(const Table& table) {
-    if (table.find(kHeight.name))
-        throw Failure(table.input().name() + ": --to ground finds points at height 0 and takes no column " +
-                      kHeight.name);
-}
-
 int geolocate_table(Scene& scene, const GeolocateOptions& options, const Direction& direction) {
     Table table{options.input};
-    if (&direction == &kToGround) refuse_heights(table);
-    const Columns columns{table, direction};
+    const Columns columns{table, options, direction};
     if (&direction == &kToGround) scene.require_look_side();
     if (&direction == &kToGround || columns.has_doppler()) scene.require_wavelength();
 
@@ -229,13 +240,12 @@ constexpr const char* kAbout = "Brings image samples to the ground, or ground po
 constexpr const char* kDetails =
     "Reads and writes comma-separated values with a line of column names; columns that are not needed are passed\n"
     "through. A row without a solution gets a status other than 0 and empty values.\n"
-    "  ground: reads azimuth_time_s, range_time_s and, if there, doppler_hz; adds x_m, y_m, z_m, latitude_deg,\n"
-    "          longitude_deg, incidence_deg, look_deg, fm_rate_hz_s, speed_m_s, status\n"
+    "  ground: reads azimuth_time_s, range_time_s and, if there, doppler_hz and height_m; adds x_m, y_m, z_m,\n"
+    "          latitude_deg, longitude_deg, incidence_deg, look_deg, fm_rate_hz_s, speed_m_s, status\n"
     "  radar:  reads latitude_deg, longitude_deg, height_m and, if there, doppler_hz; adds azimuth_time_s,\n"
     "          range_time_s, status\n"
-    "Points of --to ground lie on the WGS84 ellipsoid; a column height_m is refused there. A computed column "
-    "whose\n"
-    "name is taken gets the prefix computed_.\n";
+    "Points of --to ground lie on the WGS84 ellipsoid, unless a column height_m or --height gives their heights.\n"
+    "A computed column whose name is taken gets the prefix computed_.\n";
 
 }  // namespace
 
@@ -253,6 +263,7 @@ void add_geolocate(CLI::App& app, Job& job) {
     command->add_option("--wavelength", options.wavelength_m, "Wavelength in m, instead of the header's");
     command->add_option("--look", options.look, "Look side, instead of the header's")
         ->check(CLI::IsMember({"right", "left"}));
+    command->add_option("--height", options.height_m, "Height of all ground points in m, instead of a column's");
     command->add_option("--resample", options.resample_s, "State vectors at most so many seconds apart");
     add_waitbar_option(*command, options.waitbar);
 }

@@ -3,22 +3,9 @@
 #include <limits>
 
 #include "diagnosticslib/call_frame.h"
-#include "generalSAR/orbit/orbit_model.h"
+#include "generalSAR/orbit/orbit_points.h"
 #include "quo_base/generalSARorbit.h"
 #include "quo_base/geo_grid.h"
-
-namespace quo {
-
-/** One image sample: where the platform is on its run's curve, and the ground point it sees. */
-struct OrbitSample {
-    OrbitSegment curve;
-    double since_run_start_s;
-    Vec3 position, velocity, point;
-
-    [[nodiscard]] OrbitState state() const noexcept { return orbit_state(curve, since_run_start_s); }
-};
-
-}  // namespace quo
 
 namespace {
 
@@ -30,46 +17,6 @@ constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
 using Obj = GeneralSAROrbit;
 
 bool finite_point(const double xyz[3]) noexcept { return xyz && std::isfinite(xyz[0] + xyz[1] + xyz[2]); }
-
-/** The first guess's two solutions lie to either side of the place abeam; which is right depends on the Doppler's
- * sign, the guess takes the one further along the signed flight direction. Newton's method mostly mends a wrong
- * choice within the run. */
-constexpr double kFirstRoot = 1.0, kOtherRoot = -1.0;
-
-/** On longer arcs straight flight is no guess, and already on shorter ones the coarse curve is none: it leads to
- * the far side of the Earth, where the equations have a solution, too. */
-constexpr double kLongArc_rad = 5.0, kLongCoarseArc_rad = 3.0;
-
-/** When the point is seen where the first guess does not lead there: from the other guess through the whole orbit,
- * from the nearest state vector, or wherever the Doppler equation changes sign. 0 or 12. */
-int search_times(const quo::OrbitModel& model, const quo::Target& target, quo::PointTimes* found) noexcept {
-    quo::PointTimes guess{};
-    if (model.arc_rad() <= kLongArc_rad && target.fd_hz != 0.0 &&
-        model.linear_guess(target.point, target.range_rate_m_s(), kOtherRoot, &guess) &&
-        model.solve_anywhere(guess.since_first_s, target, found) == QUO_OK)
-        return QUO_OK;
-    if (model.solve_anywhere(model.nearest_start(target.point), target, found) == QUO_OK) return QUO_OK;
-    return model.search_all(target, found);
-}
-
-/** When the point is seen: on the run that the first guess lands in, else by a search. 0 or 12. */
-int find_times(quo::OrbitModel& model, const quo::Target& target, bool precise, double* t,
-               double* range_s) noexcept {
-    const double rate = target.range_rate_m_s();
-    quo::PointTimes guess{};
-    if (model.arc_rad() <= (precise ? kLongCoarseArc_rad : kLongArc_rad)) {
-        const bool at_hand =
-            !precise && model.guess_on_current(target.point, rate, kFirstRoot, &guess.since_first_s);
-        if (at_hand || model.linear_guess(target.point, rate, kFirstRoot, &guess)) {
-            if (precise) guess.since_first_s = model.coarse_guess(target);
-            if (model.solve_near(guess.since_first_s, target, t, range_s) == QUO_OK) return QUO_OK;
-        }
-    }
-    quo::PointTimes found{};
-    if (const int status = search_times(model, target, &found)) return status;
-    model.settle(found, target, t, range_s);
-    return QUO_OK;
-}
 
 /** Where a line from S along a unit vector first meets the ellipsoid, as a distance; not-a-number where it passes
  * by. Squashed to the unit sphere, the line S + d u meets it where |s|^2 + 2 d s.w + d^2 |w|^2 = 1. */
@@ -99,28 +46,25 @@ int fill_point(Obj& orbit, double azimuth, double range, geopoint& point) noexce
 int Obj::platformAt(quo::CallerFrame frame, double t, quo::OrbitSample* sample) noexcept {
     if (!modelReady()) return frame.fail(QUO_REFUSED, kNoModel);
     if (!std::isfinite(t)) return frame.fail(QUO_REFUSED, kBadArgument);
-    sample->curve = model_->select(t).curve();
-    const double u = sample->since_run_start_s = t - model_->reference();
-    sample->position = orbit_position(sample->curve, u);
-    sample->velocity = orbit_velocity(sample->curve, u);
+    place_platform(*model_, model_->cursor(), t, sample);
     return QUO_OK;
 }
 
 int Obj::sampleAt(quo::CallerFrame frame, double t, double range, double doppler,
                   quo::OrbitSample* sample) noexcept {
     if (const int status = platformAt(frame, t, sample)) return status;
-    const quo::RadarLook look{range, doppler, lambda_, static_cast<double>(look_sign_)};
-    const int status = ground_point(sample->position, sample->velocity, look, quo::kWgs84, &sample->point);
+    const int status = find_ground({range, doppler, lambda_, static_cast<double>(look_sign_)}, sample);
     return status ? frame.callee(status) : QUO_OK;
 }
 
 /** Solves a sample under the getter's own name, and lets `read` take from it what was asked for. */
 template <typename Read>
-int Obj::readSample(const char* getter, bool writable, double t, double range, double doppler,
+int Obj::readSample(const char* getter, bool writable, double t, double range, double doppler, double height,
                     const Read& read) noexcept {
     quo::CallFrame frame{getter, kSource};
     if (!writable) return frame.fail(QUO_REFUSED, kBadArgument);
     quo::OrbitSample sample;
+    sample.height_m = height;
     if (const int status = sampleAt(frame, t, range, doppler, &sample)) return status;
     read(sample);
     return frame.success();
@@ -142,21 +86,12 @@ int Obj::sat2earth(const double pos[3], const double vel[3], double range, doubl
 int Obj::sat2earth(double t, double range, double* xyz) noexcept { return sat2earth(t, range, 0.0, xyz); }
 
 int Obj::sat2earth(double t, double range, double doppler, double* xyz) noexcept {
-    return readSample("GeneralSAROrbit::sat2earth", xyz, t, range, doppler,
-                      [xyz](const quo::OrbitSample& sample) { quo::store(sample.point, xyz); });
+    return sat2earth(t, range, doppler, 0.0, xyz);
 }
 
 int Obj::sat2earth(double t, double range, double doppler, double height, double* xyz) noexcept {
-    quo::CallFrame frame{"GeneralSAROrbit::sat2earth", kSource};
-    if (!xyz) return frame.fail(QUO_REFUSED, kBadArgument);
-    quo::OrbitSample sample;
-    if (const int status = platformAt(frame, t, &sample)) return status;
-    const quo::RadarLook look{range, doppler, lambda_, static_cast<double>(look_sign_)};
-    if (const int status = ground_point_at_height(sample.position, sample.velocity, look, 0.0, height, quo::kWgs84,
-                                                  &sample.point))
-        return frame.callee(status);
-    quo::store(sample.point, xyz);
-    return frame.success();
+    return readSample("GeneralSAROrbit::sat2earth", xyz, t, range, doppler, height,
+                      [xyz](const quo::OrbitSample& sample) { quo::store(sample.point, xyz); });
 }
 
 double* Obj::sat2earth(const double pos[3], const double vel[3], double range) noexcept {
@@ -194,6 +129,7 @@ int Obj::sat2earthSquinted(double t, double range, double squint, double* xyz, d
     quo::CallFrame frame{"GeneralSAROrbit::sat2earthSquinted", kSource};
     if (!xyz || !time || !std::isfinite(squint)) return frame.fail(QUO_REFUSED, kBadArgument);
     quo::OrbitSample sample;
+    sample.height_m = 0.0;
     if (const int status = sampleAt(frame, t, range, 0.0, &sample)) return status;
 
     const quo::Vec3 line = sample.point - sample.position;
@@ -220,7 +156,7 @@ int Obj::earth2satLinear(const double xyz[3], double* t, double* rangeTime, doub
     if (!t || !rangeTime || !finite_point(xyz) || !std::isfinite(rate))
         return frame.fail(QUO_REFUSED, kBadArgument);
     quo::PointTimes guess{};
-    if (!model_->linear_guess(quo::load(xyz), rate, kFirstRoot, &guess)) return frame.callee(QUO_NOT_SEEN);
+    if (!model_->linear_guess(quo::load(xyz), rate, quo::kFirstRoot, &guess)) return frame.callee(QUO_NOT_SEEN);
     *t = model_->first_time() + guess.since_first_s;
     *rangeTime = guess.range_s;
     return frame.success();
@@ -236,7 +172,8 @@ int Obj::locate(quo::CallerFrame frame, const double xyz[3], double doppler, boo
     if (!finite_point(xyz) || !std::isfinite(0.5 * lambda_ * doppler))
         return frame.fail(QUO_REFUSED, kBadArgument);
     const quo::Target target{quo::load(xyz), lambda_, doppler};
-    if (const int status = find_times(*model_, target, precise, t, rangeTime)) return frame.callee(status);
+    if (const int status = quo::find_times(*model_, model_->cursor(), target, precise, t, rangeTime))
+        return frame.callee(status);
     return frame.success();
 }
 
@@ -280,16 +217,21 @@ double Obj::earth2satAzimuth(double x, double y, double z) noexcept {
 // --- geometry of a sample ---------------------------------------------------------------------------------------
 
 int Obj::SVGetGeometry(double t, double range, double doppler, GrPtGeometry* geometry) noexcept {
-    return readSample(
-        "GeneralSAROrbit::SVGetGeometry", geometry, t, range, doppler, [&](const quo::OrbitSample& sample) {
-            *geometry = quo::sample_geometry(sample.state(), sample.point, lambda_, 0.0, quo::kWgs84);
-        });
+    return SVGetGeometry(t, range, doppler, 0.0, geometry);
+}
+
+int Obj::SVGetGeometry(double t, double range, double doppler, double height, GrPtGeometry* geometry) noexcept {
+    return readSample("GeneralSAROrbit::SVGetGeometry", geometry, t, range, doppler, height,
+                      [&](const quo::OrbitSample& sample) {
+                          *geometry = quo::sample_geometry(sample.state(), sample.point, height, lambda_, 0.0,
+                                                           quo::kWgs84);
+                      });
 }
 
 // A single part costs a fraction of the whole: each getter works out its own alone.
 
 int Obj::SVGetLatLon(double t, double range, double doppler, double* latitude, double* longitude) noexcept {
-    return readSample("GeneralSAROrbit::SVGetLatLon", latitude && longitude, t, range, doppler,
+    return readSample("GeneralSAROrbit::SVGetLatLon", latitude && longitude, t, range, doppler, 0.0,
                       [&](const quo::OrbitSample& sample) {
                           const GeodeticPoint place = to_geodetic(sample.point, quo::kWgs84);
                           *latitude = place.latitude_deg;
@@ -298,7 +240,7 @@ int Obj::SVGetLatLon(double t, double range, double doppler, double* latitude, d
 }
 
 int Obj::SVGetAngles(double t, double range, double doppler, double* incidence, double* look) noexcept {
-    return readSample("GeneralSAROrbit::SVGetAngles", incidence && look, t, range, doppler,
+    return readSample("GeneralSAROrbit::SVGetAngles", incidence && look, t, range, doppler, 0.0,
                       [&](const quo::OrbitSample& sample) {
                           *incidence = quo::incidence_deg(sample.position, sample.point, quo::kWgs84);
                           *look = quo::look_angle_deg(sample.position, sample.point);
@@ -306,13 +248,14 @@ int Obj::SVGetAngles(double t, double range, double doppler, double* incidence, 
 }
 
 int Obj::SVGetFR(double t, double range, double doppler, double* rate) noexcept {
-    return readSample("GeneralSAROrbit::SVGetFR", rate, t, range, doppler, [&](const quo::OrbitSample& sample) {
-        *rate = quo::fm_rate_hz_s(sample.state(), sample.point, lambda_, 0.0);
-    });
+    return readSample("GeneralSAROrbit::SVGetFR", rate, t, range, doppler, 0.0,
+                      [&](const quo::OrbitSample& sample) {
+                          *rate = quo::fm_rate_hz_s(sample.state(), sample.point, lambda_, 0.0);
+                      });
 }
 
 int Obj::SVGetSatSpeed(double t, double range, double doppler, double* speed) noexcept {
-    return readSample("GeneralSAROrbit::SVGetSatSpeed", speed, t, range, doppler,
+    return readSample("GeneralSAROrbit::SVGetSatSpeed", speed, t, range, doppler, 0.0,
                       [&](const quo::OrbitSample& sample) { *speed = norm(sample.velocity); });
 }
 

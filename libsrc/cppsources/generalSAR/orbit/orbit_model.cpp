@@ -11,13 +11,7 @@
 namespace quo {
 namespace {
 
-// A run is kept from this many spacings after its first vector to this many; beyond, another one is closer.
-constexpr double kKeepFrom = 0.6, kKeepUntil = 3.4;
 constexpr double kEndTolerance_s = 1e-4;
-
-void difference(const double from[3], const double to[3], double time_s, double velocity_m_s[3]) noexcept {
-    for (int axis = 0; axis < 3; ++axis) velocity_m_s[axis] = (to[axis] - from[axis]) / time_s;
-}
 
 }  // namespace
 
@@ -36,11 +30,17 @@ void along_track_rotation(const double v[3], double R[9], double* speed) noexcep
     *speed = sign * length;
 }
 
-StraightFlight StraightFlight::of(const double velocity_m_s[3]) noexcept {
-    double R[9], speed = 0.0;
-    along_track_rotation(velocity_m_s, R, &speed);
+namespace {
+
+/** The straight flight from one place to another. */
+StraightFlight straight_flight(const double from[3], const double to[3], double time_s) noexcept {
+    double velocity[3], R[9], speed = 0.0;
+    for (int axis = 0; axis < 3; ++axis) velocity[axis] = (to[axis] - from[axis]) / time_s;
+    along_track_rotation(velocity, R, &speed);
     return {{R[0], R[3], R[6]}, speed, speed != 0.0 ? 1.0 / speed : 0.0};
 }
+
+}  // namespace
 
 std::unique_ptr<OrbitModel> OrbitModel::create(std::int32_t vectors) noexcept {
     const std::int32_t count = vectors - kRunVectors + 1;
@@ -57,12 +57,12 @@ void OrbitModel::copy(const OrbitModel& other) noexcept {
 int OrbitModel::build(const StateVectors& states, double t0) noexcept {
     ready_ = false;
     resampling_m_ = 0.0;
-    t0_ = t0;
-    dt_ = states.spacing_s;
+    times_ = {t0, states.spacing_s, static_cast<double>(runs_count_ - 1)};
     if (const int status = fit_runs(states)) return status;
-    take(0);
+    cursor_.in_use = use_run(times_, 0.0);
     if (const int status = fit_whole(states)) return status;
-    switches_ = 0;
+    fresh_ = cursor_.in_use;
+    cursor_.switches = 0;
     ready_ = true;
     return QUO_OK;
 }
@@ -70,12 +70,10 @@ int OrbitModel::build(const StateVectors& states, double t0) noexcept {
 int OrbitModel::fit_runs(const StateVectors& states) noexcept {
     for (std::int32_t k = 0; k < runs_count_; ++k) {
         OrbitRun& run = runs_[static_cast<std::size_t>(k)];
-        if (const int status =
-                orb_interp(0.0, dt_, states.position(k), states.velocity(k), kRunVectors, run.x, run.y, run.z))
+        if (const int status = orb_interp(0.0, spacing(), states.position(k), states.velocity(k), kRunVectors,
+                                          run.x, run.y, run.z))
             return status;
-        double velocity[3];
-        difference(states.position(k), states.position(k + kRunVectors - 1), (kRunVectors - 1) * dt_, velocity);
-        run.chord = StraightFlight::of(velocity);
+        run.chord = straight_flight(states.position(k), states.position(k + kRunVectors - 1), times_.run_length());
     }
     return QUO_OK;
 }
@@ -84,60 +82,30 @@ int OrbitModel::fit_whole(const StateVectors& states) noexcept {
     const double step = length() * 0.25;
     double positions[3 * kRunVectors], velocities[3 * kRunVectors];
     for (int i = 0; i < kRunVectors; ++i) {
-        const double t = t0_ + i * step;
+        const double t = first_time() + i * step;
         const OrbitSegment curve = select(t).curve();
-        store(orbit_position(curve, t - tc_), positions + 3 * i);
-        store(orbit_velocity(curve, t - tc_), velocities + 3 * i);
+        store(orbit_position(curve, t - reference()), positions + 3 * i);
+        store(orbit_velocity(curve, t - reference()), velocities + 3 * i);
     }
-    double velocity[3];
-    difference(states.position(0), states.position(vectors() - 1), length(), velocity);
-    mean_ = StraightFlight::of(velocity);
+    mean_ = straight_flight(states.position(0), states.position(vectors() - 1), length());
     arc_rad_ = std::abs(run(0).chord.speed_m_s) * length() / norm(run(0).start());
     return orb_interp(0.0, step, positions, velocities, kRunVectors, coarse_x_, coarse_y_, coarse_z_);
 }
 
-void OrbitModel::take(std::int32_t k) noexcept {
-    if (k != current_) ++switches_;
-    current_ = k;
-    tc_ = t0_ + k * dt_;
-    earliest_ = tc_ + kKeepFrom * dt_;
-    latest_ = tc_ + kKeepUntil * dt_;
-}
-
-// Where t left the run through its early edge, the new one ends a little after t, otherwise it starts
-// a little before, so that a sweep in either direction can go on in it for as long as possible.
-void OrbitModel::choose(double t) noexcept {
-    const std::int32_t last = runs_count_ - 1;
-    const double u = t - t0_;
-    double k = 0.0;
-    if (u > length())
-        k = last;
-    else if (u >= 0.0 && std::abs(t - tc_) < kKeepFrom * dt_)
-        k = std::ceil((u + kKeepFrom * dt_) / dt_) - 4.0;
-    else if (u >= 0.0)
-        k = std::floor((u - kKeepFrom * dt_) / dt_);
-    take(static_cast<std::int32_t>(std::clamp(k, 0.0, static_cast<double>(last))));
-}
-
-std::int32_t OrbitModel::centred_run(double spacings) const noexcept {
-    const double inside = std::clamp(spacings, 0.0, static_cast<double>(vectors()));
-    return std::clamp(static_cast<std::int32_t>(std::lround(inside)) - 2, 0, runs_count_ - 1);
-}
-
 bool OrbitModel::linear_guess(const Vec3& point, double rate_m_s, double turn, PointTimes* guess) const noexcept {
-    const double coarse = mean_.time_of(point - run(0).start(), rate_m_s, turn) / dt_;
+    const double coarse = mean_.time_of(point - run(0).start(), rate_m_s, turn) / spacing();
     if (!std::isfinite(coarse)) return false;
-    const std::int32_t k = centred_run(coarse);
+    const std::int32_t k = centred(coarse);
     const OrbitRun& here = run(k);
     const Vec3 d = point - here.start();
     const double time = here.chord.time_of(d, rate_m_s, turn);
     if (!std::isfinite(time)) return false;
-    *guess = {k * dt_ + time, 2.0 / kLightSpeed * here.chord.distance(d, time)};
+    *guess = {k * spacing() + time, 2.0 / kLightSpeed * here.chord.distance(d, time)};
     return true;
 }
 
 double OrbitModel::coarse_guess(const Target& target) const noexcept {
-    ImageTime seen{0.5 * length(), 0.0, false};
+    ImageTime seen{0.5 * length(), 0.0, false, false};
     // Three times the orbit's span: a guess may miss it by a little, and Newton's steps on their way by a lot.
     const TimeSpan span{-length(), 2.0 * length()};
     image_time({coarse_x_, coarse_y_, coarse_z_}, target.point, seen.t_s, span, target.lambda_m, target.fd_hz,
@@ -145,41 +113,43 @@ double OrbitModel::coarse_guess(const Target& target) const noexcept {
     return seen.t_s;
 }
 
-int OrbitModel::solve_near(double guess_since_first_s, const Target& target, double* t, double* range_s) noexcept {
-    constexpr double kSpacings = kRunVectors - 1;
-    double guess = t0_ + guess_since_first_s;
-    for (std::int32_t before = -1;; before = current_) {
-        const OrbitRun& here = select(guess);
-        if (current_ == before) return QUO_OK;
-        const double length = kSpacings * dt_;
+int OrbitModel::solve_near(RunCursor& cursor, double guess_since_first_s, const Target& target, double* t,
+                           double* range_s) const noexcept {
+    const double length = times_.run_length();
+    double guess = first_time() + guess_since_first_s;
+    for (double before = -1.0;; before = cursor.in_use.number) {
+        const OrbitRun& here = select(cursor, guess);
+        const RunInUse& in_use = cursor.in_use;
+        if (in_use.number == before) return QUO_OK;
         ImageTime seen{};
-        const int status = image_time(here.curve(), target.point, std::clamp(guess - tc_, 0.0, length),
+        const int status = image_time(here.curve(), target.point, std::clamp(guess - in_use.start_s, 0.0, length),
                                       {0.0, length}, target.lambda_m, target.fd_hz, &seen);
         const bool solved = status == QUO_OK && seen.settled && seen.t_s >= 0.0 && seen.t_s <= length;
-        if (!solved) return before < 0 ? static_cast<int>(QUO_NOT_SEEN) : static_cast<int>(QUO_OK);
-        guess = *t = tc_ + seen.t_s;
+        if (!solved) return before < 0.0 ? static_cast<int>(QUO_NOT_SEEN) : static_cast<int>(QUO_OK);
+        guess = *t = in_use.start_s + seen.t_s;
         *range_s = seen.tau_s;
         // A guess at the edge of a run's middle leads out of it, where another run serves: once more there.
-        if (before >= 0 || (guess >= earliest_ && guess <= latest_)) return QUO_OK;
+        if (before >= 0.0 || (guess >= in_use.earliest_s && guess <= in_use.latest_s)) return QUO_OK;
     }
 }
 
-void OrbitModel::settle(const PointTimes& found, const Target& target, double* t, double* range_s) noexcept {
-    if (solve_near(found.since_first_s, target, t, range_s) == QUO_OK) return;
-    *t = t0_ + found.since_first_s;
+void OrbitModel::settle(RunCursor& cursor, const PointTimes& found, const Target& target, double* t,
+                        double* range_s) const noexcept {
+    if (solve_near(cursor, found.since_first_s, target, t, range_s) == QUO_OK) return;
+    *t = first_time() + found.since_first_s;
     *range_s = found.range_s;
 }
 
 int OrbitModel::solve_anywhere(double guess_since_first_s, const Target& target,
                                PointTimes* found) const noexcept {
-    const double length = (kRunVectors - 1) * dt_;
+    const double dt = spacing(), length = times_.run_length();
     const std::int32_t last = runs_count_ - 1;
     double since_first = guess_since_first_s;
     // Each turn moves on by up to a run's length: the turns suffice for any orbit and end any to and fro.
     for (std::int32_t turn = 0; turn < runs_count_ + 2; ++turn) {
-        const std::int32_t k = centred_run(since_first / dt_);
+        const std::int32_t k = centred(since_first / dt);
         ImageTime seen{};
-        if (image_time(run(k).curve(), target.point, std::clamp(since_first - k * dt_, 0.0, length),
+        if (image_time(run(k).curve(), target.point, std::clamp(since_first - k * dt, 0.0, length),
                        {-length, 2.0 * length}, target.lambda_m, target.fd_hz, &seen) ||
             !seen.settled)
             return QUO_NOT_SEEN;
@@ -187,11 +157,11 @@ int OrbitModel::solve_anywhere(double guess_since_first_s, const Target& target,
         const double early = k == 0 ? -kEndTolerance_s : 0.0;
         const double late = k == last ? length + kEndTolerance_s : length;
         if (u >= early && u <= late) {
-            *found = {k * dt_ + u, seen.tau_s};
+            *found = {k * dt + u, seen.tau_s};
             return QUO_OK;
         }
         if ((u < early && k == 0) || (u > late && k == last)) return QUO_NOT_SEEN;
-        since_first = k * dt_ + u;
+        since_first = k * dt + u;
     }
     return QUO_NOT_SEEN;
 }
@@ -210,7 +180,7 @@ struct OrbitModel::Crossing {
 
 OrbitModel::Crossing OrbitModel::crossing_at(double since_first_s, std::int32_t run_number,
                                              const Target& target) const noexcept {
-    const OrbitState platform = orbit_state(run(run_number).curve(), since_first_s - run_number * dt_);
+    const OrbitState platform = orbit_state(run(run_number).curve(), since_first_s - run_number * spacing());
     const DopplerResidual at = doppler_residual(platform, target.point, target.range_rate_m_s());
     return {since_first_s, at.value, at.slope, 2.0 / kLightSpeed * std::sqrt(at.range2_m2)};
 }
@@ -278,14 +248,15 @@ int OrbitModel::search_all(const Target& target, PointTimes* found) const noexce
     // Neighbouring runs differ a little, and each serves for times that others serve for as well. Where two
     // solutions nearly meet only one of the runs may have them, so that each is searched over all it serves for.
     const std::int32_t last = runs_count_ - 1;
+    const double dt = spacing();
     Nearest nearest{found};
     for (std::int32_t k = 0; k <= last; ++k) {
-        const double from = k == 0 ? -kEndTolerance_s : (k + kKeepFrom) * dt_;
-        const double to = k == last ? length() + kEndTolerance_s : (k + kKeepUntil) * dt_;
+        const double from = k == 0 ? -kEndTolerance_s : (k + kKeepFrom) * dt;
+        const double to = k == last ? length() + kEndTolerance_s : (k + kKeepUntil) * dt;
         double at = from;
         for (std::int32_t vector = k + 1; vector <= k + 3; ++vector) {
-            search_piece(at, vector * dt_, k, target, nearest);
-            at = vector * dt_;
+            search_piece(at, vector * dt, k, target, nearest);
+            at = vector * dt;
         }
         search_piece(at, to, k, target, nearest);
     }
@@ -301,7 +272,7 @@ double OrbitModel::nearest_start(const Vec3& point) const noexcept {
         nearest2 = dot(d, d);
         at = k;
     }
-    return at * dt_;
+    return at * spacing();
 }
 
 }  // namespace quo

@@ -6,47 +6,10 @@
 #include <memory>
 
 #include "generalSAR/orbit/orbit_interpolation.h"
+#include "generalSAR/orbit_arrays/array_kernels.h"
 #include "sarutillib/geometry/geometry_kernels.h"
 
 namespace quo {
-
-/** A straight flight: unit vector and speed, both turned so that the speed has the sign of the velocity's x
- * component (positive for 0). The turn changes no time of travel; it decides which of two solutions comes first.
- */
-struct StraightFlight {
-    Vec3 axis;
-    double speed_m_s;
-    double per_speed;  // 1 / speed, 0 for a platform that stands still
-
-    /** Of a finite velocity. */
-    static StraightFlight of(const double velocity_m_s[3]) noexcept;
-    /** Time from the flight's start to one of the two places from which a target at d from the start, m, has the
-     * range rate `rate_m_s` or its negative: the place further along the axis for turn 1, further back for -1. Not
-     * finite where the speed does not allow the rate. */
-    [[nodiscard]] double time_of(const Vec3& d, double rate_m_s, double turn) const noexcept {
-        const double along = dot(axis, d);
-        if (rate_m_s == 0.0) return along * per_speed;
-        // The cone of directions with that rate: the place lies as far along as the target is aside, times this.
-        const double k = rate_m_s * rate_m_s * per_speed * per_speed;
-        const double aside2 = dot(d, d) - along * along;
-        return (along + turn * std::sqrt(k * aside2 / (1.0 - k))) * per_speed;
-    }
-    /** Distance of that target after `time` seconds of flight, m. */
-    [[nodiscard]] double distance(const Vec3& d, double time) const noexcept {
-        return norm(d - (time * speed_m_s) * axis);
-    }
-};
-
-/** A run of five state vectors: the curve through their positions in the time since the first, coefficients as in
- * interp_orb.h, and the chord from first to last. What one point needs stands together. */
-struct OrbitRun {
-    double x[5], y[5], z[5];
-    StraightFlight chord;
-
-    [[nodiscard]] OrbitSegment curve() const noexcept { return {x, y, z}; }
-    /** Position of the first vector, m. */
-    [[nodiscard]] Vec3 start() const noexcept { return {x[4], y[4], z[4]}; }
-};
 
 /** When a point is seen: time since the first state vector of the orbit, and two-way range time, s. */
 struct PointTimes {
@@ -60,13 +23,17 @@ struct Target {
     [[nodiscard]] double range_rate_m_s() const noexcept { return 0.5 * lambda_m * fd_hz; }
 };
 
+/** A run in use, and how often another one was taken. Searches go on from one run to the next with it. */
+struct RunCursor {
+    RunInUse in_use;
+    std::int64_t switches;
+};
+
 /** What an orbit model holds beside its runs. */
 struct OrbitModelValues {
-    double t0_ = 0.0, dt_ = 0.0;  // first vector and spacing
-    std::int32_t current_ = 0;
-    double tc_ = 0.0;                       // time of the current run's first vector
-    double earliest_ = 0.0, latest_ = 0.0;  // the times for which the current run is kept
-    std::int64_t switches_ = 0;
+    RunTimes times_{};
+    RunCursor cursor_{};
+    RunInUse fresh_{};
     StraightFlight mean_{};                                 // from the first vector to the last
     double coarse_x_[5]{}, coarse_y_[5]{}, coarse_z_[5]{};  // the whole orbit, in the time since the first vector
     double resampling_m_ = 0.0;  // what the interpolation that made the vectors may have left
@@ -79,7 +46,7 @@ struct OrbitModelValues {
  * Range rates are lambda fd / 2, in m/s, positive while the platform approaches. */
 class OrbitModel : private OrbitModelValues {
 public:
-    static constexpr std::int32_t kRunVectors = 5;
+    static constexpr std::int32_t kRunVectors = quo::kRunVectors;
 
     /** Tables for at least five vectors; null when memory cannot be had. */
     static std::unique_ptr<OrbitModel> create(std::int32_t vectors) noexcept;
@@ -103,43 +70,55 @@ public:
     [[nodiscard]] std::int32_t vectors() const noexcept { return runs_count_ + kRunVectors - 1; }
     [[nodiscard]] std::int32_t runs() const noexcept { return runs_count_; }
     [[nodiscard]] const OrbitRun& run(std::int32_t k) const noexcept { return runs_[static_cast<std::size_t>(k)]; }
-    [[nodiscard]] double first_time() const noexcept { return t0_; }
-    [[nodiscard]] double spacing() const noexcept { return dt_; }
-    [[nodiscard]] double length() const noexcept { return (vectors() - 1) * dt_; }
-    [[nodiscard]] std::int64_t switches() const noexcept { return switches_; }
+    [[nodiscard]] double first_time() const noexcept { return times_.first_s; }
+    [[nodiscard]] double spacing() const noexcept { return times_.spacing_s; }
+    [[nodiscard]] double length() const noexcept { return (vectors() - 1) * spacing(); }
+    [[nodiscard]] std::int64_t switches() const noexcept { return cursor_.switches; }
 
-    /** Makes the current run suit time t, which is finite, and returns it. */
-    const OrbitRun& select(double t) noexcept {
-        if (!(earliest_ <= t && t <= latest_)) choose(t);
-        return run(current_);
+    /** Makes the run in use suit time t, which is finite, and returns it. */
+    const OrbitRun& select(RunCursor& cursor, double t) const noexcept {
+        const RunInUse next = next_run(times_, cursor.in_use, t);
+        if (next.number != cursor.in_use.number) ++cursor.switches;
+        cursor.in_use = next;
+        return run_of(next);
     }
-    /** Time of the current run's first vector. */
-    [[nodiscard]] double reference() const noexcept { return tc_; }
+    const OrbitRun& select(double t) noexcept { return select(cursor_, t); }
+    /** The model's own run in use, and time of its first vector. */
+    [[nodiscard]] RunCursor& cursor() noexcept { return cursor_; }
+    [[nodiscard]] double reference() const noexcept { return cursor_.in_use.start_s; }
+    /** The run in use when the model was made: with it a call's results do not hang on the calls before. */
+    [[nodiscard]] RunCursor fresh() const noexcept { return {fresh_, 0}; }
+    /** What the array kernels know of the model. */
+    [[nodiscard]] OrbitView view(double lambda_m, double side) const noexcept {
+        return {runs_.get(), times_, fresh_, mean_, lambda_m, side};
+    }
 
     /** First guess of a point's times in closed form, `turn` as in StraightFlight::time_of(). False where the
      * speed does not allow the range rate. */
     bool linear_guess(const Vec3& point, double rate_m_s, double turn, PointTimes* guess) const noexcept;
-    /** The same on the current run alone, as a time since the first vector. False unless it lies within a spacing
-     * of the run's middle. A guess in low orbit is off by about a tenth of its distance from the middle: one that
-     * near would keep the run with linear_guess() as well. Points in the order of an image mostly need no more. */
-    bool guess_on_current(const Vec3& point, double rate_m_s, double turn, double* since_first_s) const noexcept {
-        const OrbitRun& here = run(current_);
+    /** The same on the run in use alone, as a time since the first vector. False unless it is_at_hand(). Points in
+     * the order of an image mostly need no more. */
+    bool guess_on(const RunInUse& in_use, const Vec3& point, double rate_m_s, double turn,
+                  double* since_first_s) const noexcept {
+        const OrbitRun& here = run_of(in_use);
         const double u = here.chord.time_of(point - here.start(), rate_m_s, turn);
-        *since_first_s = (tc_ - t0_) + u;
-        return dt_ <= u && u <= 3.0 * dt_;
+        *since_first_s = (in_use.start_s - first_time()) + u;
+        return is_at_hand(times_, u);
     }
     /** Time of a point on the coarse curve since the first vector, for a first guess. */
     double coarse_guess(const Target& target) const noexcept;
-    /** When the point is seen: Newton's method from a first guess, on the current run made to suit it. `t` is on
+    /** When the point is seen: Newton's method from a first guess, on the run in use made to suit it. `t` is on
      * the absolute scale. Where the solution leaves the middle of that run it is found again on the run that
      * serves there. 0, or 12 when it lies outside the run or the steps ran out; nothing is then written. */
-    int solve_near(double guess_since_first_s, const Target& target, double* t, double* range_s) noexcept;
+    int solve_near(RunCursor& cursor, double guess_since_first_s, const Target& target, double* t,
+                   double* range_s) const noexcept;
     /** Ends a search that found the point's times on some run: solves again on the run that serves that time, so
      * that the way back to the ground starts from the same curve. Where that one has no solution, as beyond the
      * ends, the times stay those found. */
-    void settle(const PointTimes& found, const Target& target, double* t, double* range_s) noexcept;
-    /** As solve_near() over the whole orbit, from run to run, until a run holds its own solution; the current run
-     * stays. A solution up to 1e-4 s beyond the first or the last vector counts as on the orbit. */
+    void settle(RunCursor& cursor, const PointTimes& found, const Target& target, double* t,
+                double* range_s) const noexcept;
+    /** As solve_near() over the whole orbit, from run to run, until a run holds its own solution. A
+     * solution up to 1e-4 s beyond the first or the last vector counts as on the orbit. */
     int solve_anywhere(double guess_since_first_s, const Target& target, PointTimes* found) const noexcept;
     /** Of all times at which the point is seen the one from nearest by, found by the changes of sign that the
      * Doppler equation makes from vector to vector, also where there are two between two vectors. 0 or 12. */
@@ -152,10 +131,12 @@ public:
 private:
     OrbitModel(std::unique_ptr<OrbitRun[]> runs, std::int32_t count) noexcept
         : runs_{std::move(runs)}, runs_count_{count} {}
-    void choose(double t) noexcept;
-    void take(std::int32_t k) noexcept;
-    /** The run with the vector nearest to a time in its middle, as far as there is one. `spacings` is finite. */
-    [[nodiscard]] std::int32_t centred_run(double spacings) const noexcept;
+    [[nodiscard]] const OrbitRun& run_of(const RunInUse& in_use) const noexcept {
+        return run(static_cast<std::int32_t>(in_use.number));
+    }
+    [[nodiscard]] std::int32_t centred(double spacings) const noexcept {
+        return static_cast<std::int32_t>(centred_run(times_, spacings));
+    }
     struct Crossing;
     [[nodiscard]] Crossing crossing_at(double since_first_s, std::int32_t run_number,
                                        const Target& target) const noexcept;

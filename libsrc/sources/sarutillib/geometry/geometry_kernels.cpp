@@ -87,16 +87,14 @@ int refine_ground_point(const Vec3& S, const Vec3& V, const RadarLook& look, dou
 
 int ground_point_at_height(const Vec3& S, const Vec3& V, const RadarLook& look, double omega, double height_m,
                            const Ellipsoid& e, Vec3* P) noexcept {
-    constexpr double kClose = 1e-7;  // m
-    constexpr int kRounds = 10;
     if (!(e.equatorial_m > 0.0 && e.polar_m > 0.0)) return QUO_REFUSED;  // the lengthened axes could be
     double longer_m = height_m;
-    for (int round = 0; round < kRounds; ++round) {
+    for (int round = 0; round < kHeightRounds; ++round) {
         Vec3 point;
         const Ellipsoid raised{e.equatorial_m + longer_m, e.polar_m + longer_m};
         if (const int status = turning_ground_point(S, V, look, omega, raised, &point)) return status;
-        const double lacking_m = height_m - to_geodetic(point, e).height_m;
-        if (std::abs(lacking_m) <= kClose) {
+        const double lacking_m = height_m - geodetic_normal(point, e.equatorial_m, e.polar_m).height_m;
+        if (std::abs(lacking_m) <= kHeightReach) {
             *P = point;
             return QUO_OK;
         }

@@ -81,7 +81,7 @@ extern "C" int gr_pt_lat_lon(double tc, double /*dt*/, double t, double tau, dou
     if (const int status =
             turning_ground_point(sat.position, sat.velocity, {tau, fd, lambda, side}, omega, earth, &point))
         return frame.callee(report_start(status));
-    *out = quo::sample_geometry(sat, point, lambda, omega, earth);
+    *out = quo::sample_geometry(sat, point, 0.0, lambda, omega, earth);
     return frame.success();
 }
 
