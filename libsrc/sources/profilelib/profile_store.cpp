@@ -46,12 +46,13 @@ ProfileContent* ProfileStore::loaded(std::string_view path) {
 
 int ProfileStore::sync(std::string_view path) {
     const File* const file = find(path);
-    return file ? write(*file) : 0;
+    return file && !looks_.contains(path) ? write(*file) : 0;
 }
 
 int ProfileStore::sync_all() {
     int status = 0;
-    for (const File& file : files_) status = write(file);
+    for (const File& file : files_)
+        if (!looks_.contains(file.path)) status = write(file);
     // Inverted: callers of this form know -1 as its success.
     return status == 0 ? -1 : 0;
 }

@@ -33,7 +33,8 @@ public:
     void free_all();
 
     /** For ProfileLook. True, unless the file is in memory for another reason; each look is then ended by
-     * end_look(). The last to end forgets the file, unless somebody has changed what stands in it. */
+     * end_look(). The last to end forgets
+     * the file, unless somebody has changed what stands in it. Until then it is not written back. */
     bool begin_look(std::string_view path);
     void end_look(std::string_view path);
     /** Notes that the file is not only looked into. */
