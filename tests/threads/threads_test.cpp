@@ -17,6 +17,7 @@
 #include <vector>
 
 #include "diagnosticslib/call_frame.h"
+#include "quo_base/SARpolynomials.h"
 #include "quo_base/acquisition.h"
 #include "quo_base/datafile.h"
 #include "quo_base/fft.h"
@@ -210,6 +211,41 @@ TEST_F(Threads, WorkingAtTheSameTimeFindWhatOneFindsAlone) {
     EXPECT_GE(numbers.size(), std::size_t{kRounds} * (kThreads + 1));
     for (const auto& [number, times] : numbers) EXPECT_EQ(times, 1) << number;
     EXPECT_EQ(std::regex_replace(text, entry, ""), "");
+}
+
+// What an object only tells, it tells to several at a time.
+TEST_F(Threads, AskOneObjectAtTheSameTime) {
+    polySAR polynomials;
+    ASSERT_EQ(polynomials.CreatePolys(1, 1, 1, 1, 1, 1), 0);
+    polynomials.DC[0].pol[0] = 3.5;
+    const double alone = polynomials.EvaluateDC(0.005, 7.0);
+    side_by_side([&](int) {
+        for (int i = 0; i < 1000; ++i) EXPECT_EQ(polynomials.EvaluateDC(0.005, 7.0), alone);
+    });
+}
+
+// Threads that write parts of one raster have an object each.
+TEST_F(Threads, WritePartsOfOneRaster) {
+    const auto describe = [&](DataFile& raster) {
+        raster.setFilename(file("parts.raw").c_str());
+        raster.NrOfPixelsPerLine = 512;
+        raster.NrOfLinesPerImage = 8 * kThreads;
+        raster.CellType = INT16;
+    };
+    DataFile whole;
+    describe(whole);
+    const std::string bytes = test::raster_bytes(whole);
+    test::write_text(file("parts.raw"), std::string(bytes.size(), '\0'));
+    side_by_side([&](int thread) {
+        DataFile part;
+        describe(part);
+        EXPECT_EQ(part.open(2), 0);
+        const auto size = static_cast<std::int64_t>(bytes.size()) / kThreads;
+        EXPECT_EQ(part.seek(thread * size, 0), 0);
+        EXPECT_EQ(part.write(bytes.data() + thread * size, size), 0);
+        EXPECT_EQ(part.close(), 0);
+    });
+    EXPECT_TRUE(test::read_text(file("parts.raw")) == bytes);
 }
 
 // A block belongs to the call that asked for it, on its own thread; who frees it does not matter.
