@@ -1,6 +1,7 @@
 #!/bin/sh
-# Installs what is missing, builds, and runs all tests: in the release, under the sanitizers, and the checks of
-# format and style. A second call builds and analyses only what has changed.
+# Installs what is missing, builds, and runs all tests: in the release, under the sanitizers (what threads do at the
+# same time under one of its own), and the checks of format and style. A second call builds and analyses only what has
+# changed.
 set -eu
 cd "$(dirname "$0")"
 scripts/install_deps.sh
@@ -14,4 +15,6 @@ build/release/tests/signallib/engines_present
 run --test-dir build/release --label-exclude lint
 scripts/build.sh asan
 run --test-dir build/asan --label-exclude lint
+scripts/build.sh tsan threads_test
+run --test-dir build/tsan --tests-regex '^threads'
 run --test-dir build/release --label-regex lint

@@ -6,7 +6,8 @@
 #include "quo_base/roi.h"
 
 /** @file
- * The mapping of a master image onto a slave image. */
+ * The mapping of a master image onto a slave image. One object serves one thread at a time; its `const` members
+ * may run side by side. */
 
 /** Two fit polynomials, one for the range and one for the azimuth coordinate of the slave, in two forms.
  *

@@ -15,8 +15,8 @@ QUO_BASE_C_BEGIN
  * Results: 0; 7 when memory cannot be had; 10 for a numerical failure or dimensions that do not fit. The lowest
  * routines write their message to the standard error stream, without a line end; a routine that passes on
  * another's status adds an ERROR_CALL_TREE entry to the report. Unless said otherwise outputs are unchanged on
- * failure and arguments must not overlap. Methods: G. H. Golub and C. F. Van Loan, "Matrix Computations", 4th ed.,
- * 2013. */
+ * failure and arguments must not overlap. Any number of threads may call at a time, on arrays of their own.
+ * Methods: G. H. Golub and C. F. Van Loan, "Matrix Computations", 4th ed., 2013. */
 
 /** Basis of a linear fit: writes the `count` basis functions at x into values[1..count]. */
 typedef void (*QuoBasisFunction)(double x, double values[], int count);

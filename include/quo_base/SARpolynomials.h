@@ -14,7 +14,8 @@ struct PolynomialLists;
  * Polynomials in range and azimuth time, and the set of them that describes a product.
  *
  * Range times are two-way, in seconds; azimuth times are seconds since 1985. Every polynomial is taken around its
- * reference point: x = range time - trg0, y = azimuth time - taz0. Operations return 0 unless said otherwise. */
+ * reference point: x = range time - trg0, y = azimuth time - taz0. Operations return 0 unless said otherwise.
+ * One object serves one thread at a time; `const` members, such as all evaluations, may run side by side. */
 
 /** c0 + c1 x + c2 y + c3 x y + c4 x^2 + c5 x^3 + c6 x^4: degree 4 in range, linear in azimuth. A new one is zero.
  */

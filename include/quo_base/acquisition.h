@@ -12,7 +12,8 @@
  * says so, reading turns to the same file as a parameter file (section of the same name) when the XML section
  * fails; every key is then read, and one that is missing gives 1. A failed read leaves the members read so far
  * changed, the rest as they were. -999 marks an unknown number, "NOT_AVAILABLE" an unknown text. Texts are
- * NUL-terminated and cut to the room of their member. */
+ * NUL-terminated and cut to the room of their member. One object serves one thread at a time; its `const` members
+ * may run side by side. */
 
 /** How the acquisition was sampled. Section "SamplingConstants"; in parameter files the keys are CarrierFrequency,
  * SamplingRate, RangeBandWidth, RangeTSamplingStep, PRF, PRI, AzimuthBandwidth, BRF, BRI and WaveLength, in the

@@ -22,7 +22,8 @@ QUO_BASE_C_BEGIN
  * written. Blocks already made by the failing call are released.
  *
  * A release function takes the same lower bounds as the allocator; upper bounds are accepted and ignored. Null is
- * accepted. "long" elements are 32-bit integers and "long double" ones are doubles. */
+ * accepted. Any number of threads may call at a time. "long" elements are 32-bit integers and "long double" ones
+ * are doubles. */
 
 QUO_BASE_API float* vector(int nl, int nh) QUO_NOEXCEPT;    /**< float elements nl..nh */
 QUO_BASE_API int* ivector(int nl, int nh) QUO_NOEXCEPT;     /**< int elements nl..nh */

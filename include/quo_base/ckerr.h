@@ -25,9 +25,15 @@ QUO_BASE_C_BEGIN
  * and on success only quo_check and deccurdep(). Every path out needs its deccurdep(): a missing one leaves the
  * depth one too high for the rest of the process.
  *
- * All state is process-wide and unguarded: the library is to be called from one thread at a time. Strings are
- * NUL-terminated byte strings, and none is kept by address beyond the call. A null text is shown as "(null)". No
- * function here changes errno, except that an allocation or opening that fails leaves its reason there. */
+ * Threads: every function here may be called by any number of threads at a time. Tracking, report and log belong
+ * to the process; each entry is written in one piece and has a number of its own. The stack of running calls, with
+ * its names, counters and depth, belongs to the thread, and so does the table of the blocks that its calls have
+ * allocated: the table of a thread that has ended goes on with the next one that begins. Any thread may free a
+ * block. A program turns tracking on before it starts threads, and off when they have ended.
+ *
+ * Strings are NUL-terminated byte strings, and none is kept by address beyond the call. A null text is shown as
+ * "(null)". No function here changes errno, except that an allocation or opening that fails leaves its reason
+ * there. */
 
 /* ---- Tracked calls ---- */
 
@@ -54,7 +60,7 @@ QUO_BASE_API void deccurdep(void) QUO_NOEXCEPT;
 QUO_BASE_API int ckflg_ckerr(void) QUO_NOEXCEPT;
 
 /** Turns tracking off. If tracked blocks are left, lists them first on the standard error stream, in the order of
- * the table: the name of the function that allocated the block and its call graph coordinates, which are the call
+ * the tables: the name of the function that allocated the block and its call graph coordinates, which are the call
  * counters (modulo 65536) at depths 0 to the function's own. The blocks are not freed. Report and log stay as they
  * are. Does nothing while tracking is off. */
 QUO_BASE_API void exit_ckerr(void) QUO_NOEXCEPT;
@@ -110,8 +116,8 @@ QUO_BASE_API void quo_check(int error_number, int line, const char* function, co
 
 /** Why the system refused what a function of the library could not do, for a message about it: ask once before the
  * call, to forget what is older, and again when its status is not 0.
- * @return the number that was last given to quo_check() since this was asked before, whether or not a report is
- * open; 0 where there was none */
+ * @return the number that this thread last gave to quo_check() since this was asked before, whether or not a
+ * report is open; 0 where there was none */
 QUO_BASE_API int quo_take_system_error(void) QUO_NOEXCEPT;
 
 /** Writes a numbered line into the log, after an empty one, and flushes it. The level is not looked at.
@@ -121,9 +127,9 @@ QUO_BASE_API int quo_add_log(const char* text) QUO_NOEXCEPT;
 /* ---- Tracked allocation ----
  *
  * Blocks are aligned to 16 bytes and must go back through free_ckerr() or freeall_ckerr(), never through free().
- * While tracking is on, each is entered in a table of 16384 together with the running function; an allocation that
- * finds the table full fails with an ERROR entry. Tracking must not be switched between a block's allocation and
- * its release. */
+ * While tracking is on, each is entered in its thread's table of 16384 together with the running function; an
+ * allocation that finds the table full fails with an ERROR entry. Tracking must not be switched between a block's
+ * allocation and its release. */
 
 /** Allocates a block for the running function.
  * @return the block, uninitialised, owned by the caller; null if there is no memory or the table is full. Nothing
@@ -141,8 +147,9 @@ QUO_BASE_API void* calloc_ckerr(size_t count, size_t size) QUO_NOEXCEPT;
  * moves to the place of the one that goes. */
 QUO_BASE_API void free_ckerr(void* block) QUO_NOEXCEPT;
 
-/** Frees every block that the running call, and the calls made from it, have allocated and not yet freed. Blocks
- * of its callers and of earlier calls stay. At depth 0, main(), every block goes. Does nothing while tracking is
+/** Frees every block that the running call, and the calls made from it, have allocated on this thread and not yet
+ * freed. Blocks of its callers, of earlier calls and of other threads stay. At depth 0, main(), every block of the
+ * thread goes. Does nothing while tracking is
  * off. */
 QUO_BASE_API void freeall_ckerr(void) QUO_NOEXCEPT;
 

@@ -18,7 +18,10 @@
  *
  * Statuses: 0; 1 refused (wrong state, a bad argument, a description whose sizes are negative or overflow, an
  * unsupported cell type, a missing header key); 4 "File reading failed!", also for a region that ends beyond the
- * file, which is found before memory is taken; 5 "File writing failed!"; 7 no memory; 9 "File not opened!". */
+ * file, which is found before memory is taken; 5 "File writing failed!"; 7 no memory; 9 "File not opened!".
+ *
+ * One object serves one thread at a time. Threads that read one raster at the same time have an object each; so
+ * have threads that write parts of it which do not overlap, without a buffer (mode 2). */
 
 /** Cell types: the codes that descriptions and memory types use. Integers are signed. */
 enum RasterCellType {

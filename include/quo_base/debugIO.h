@@ -10,7 +10,7 @@ QUO_BASE_C_BEGIN
  *
  * A dump is three 32-bit signed words in the host's byte order (element type code, first and second dimension),
  * then the elements as they lie in memory. The progress display is driven by command lines on the standard error
- * stream. */
+ * stream, each in one piece. Any number of threads may call at a time, with files of their own. */
 
 /** Size in bytes of one element of a dump, or 0 for a code that is not valid.
  * Codes 0 to 5 stand for 4, 8, 8, 16, 2 and 1 bytes: by use FLOAT32, FLOAT64, FLOAT_COMPLEX, DOUBLE_COMPLEX, INT16

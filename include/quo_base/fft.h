@@ -24,6 +24,10 @@ QUO_BASE_C_BEGIN
  * process (the 32 geometries used last), so that the same plan made again takes well under 2 microseconds.
  * Planning never touches the caller's buffers.
  *
+ * Threads: all functions may be called by any number of threads at a time. Plans are measured one after the other;
+ * transforms run side by side, by one plan too, on buffers that do not overlap. A plan is released when no thread
+ * runs it any more.
+ *
  * Relative error of a forward transform of length N (root of the mean square): at most 2e-7 * log2(N). */
 
 /** An engine's plan for a batch of one-dimensional transforms; known by handle only. A handle is never followed

@@ -19,9 +19,9 @@ QUO_BASE_C_BEGIN
  * - long date text: DD-MON-YYYY hh:mm:ss.uuuuuu, 27 characters, MON one of JAN FEB ... DEC.
  *
  * No function here takes part in the call frames or leaves an entry in the report. Errors are written to the
- * standard error stream where the function's comment says so. Nothing is kept between calls: all of it is
- * reentrant. A null text or path counts as an empty one where nothing else is said; buffers and records must be
- * there. */
+ * standard error stream where the function's comment says so. Nothing is kept between calls: any number of
+ * threads may call at a time. A null text or path counts as an empty one where nothing else is said; buffers and
+ * records must be there. */
 
 /* Byte order.
  *

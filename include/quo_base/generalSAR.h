@@ -41,7 +41,7 @@ enum GSObject : int {
 
 /** The container of a product's header objects. Each has a presence flag, which says whether its content is valid;
  * the object exists either way, with its defaults in a new container, and stays at its place as long as the
- * container lives. One container serves one thread at a time. */
+ * container lives. One container serves one thread at a time; `const` members may run side by side. */
 class QUO_BASE_API GeneralSAR {
 public:
     /** Number of objects in the container. */

@@ -20,7 +20,7 @@ class GeneralSAR;
  * A record's section is its class name. Besides its own parameters every record has five that all processors
  * share, in the section "generalProcessingConf"; these are input only. Failures of reading and writing a record
  * are thrown as quorelException. Defaults are chosen for C-band stripmap data; docs/configuration.md lists every
- * parameter with type, unit, bounds, default and meaning. */
+ * parameter with type, unit, bounds, default and meaning. One object serves one thread at a time. */
 
 /** The parameters that all processors share. Values missing in a file stay as they are. */
 class QUO_BASE_API GeneralSAR_BaseConfiguration {

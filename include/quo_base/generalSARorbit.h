@@ -23,7 +23,8 @@
  * Results are 0 for success unless said otherwise; outputs are then written, and otherwise stay as they were.
  * Whatever needs a model returns 1 while there is none (no state vectors, or computeApproximateSV() has not yet
  * run since they were made), and 1 for an argument that is null or not finite. Every failure has its entry in the
- * report. One object serves one thread at a time. */
+ * report. One object serves one thread at a time, since it keeps the run of vectors that it used last; `const`
+ * members of an orbit that nobody changes may run side by side. */
 
 namespace quo {
 class CallerFrame;

@@ -8,7 +8,8 @@
 #include "quo_base/roi.h"
 
 /** @file
- * Header objects that say where a product lies: its corners on the ground, its region of interest, its raster. */
+ * Header objects that say where a product lies: its corners on the ground, its region of interest, its raster. One
+ * object serves one thread at a time. */
 
 /** The corners and the centre of a product on the ground, and the spacing of its grid. Section
  * "GroundCornersPoints": the spacing, and below it one section per point. GeneralSAROrbit::SVGetGeoCoords() fills

@@ -15,7 +15,8 @@
  *
  * Positions are Earth-fixed x, y, z in metres, z along the Earth's axis and x in the plane of longitude 0.
  * Latitude is geodetic, from -90 to 90 degrees with north positive; longitude is positive to the east; height is
- * measured along the normal of the ellipsoid, which has semi-axes a (equatorial) and b (polar), both positive. */
+ * measured along the normal of the ellipsoid, which has semi-axes a (equatorial) and b (polar), both positive.
+ * Nothing is kept between calls: any number of threads may call at a time. */
 
 /** Speed of light, m/s: BIPM, "The International System of Units", 9th edition, 2019. */
 #define QUO_LIGHT_SPEED_M_S 299792458.0

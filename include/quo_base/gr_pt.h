@@ -17,7 +17,9 @@ QUO_BASE_C_BEGIN
  * sight. A negative look sign looks left, zero or a positive one right.
  *
  * The range, Doppler and ellipsoid equations: J. C. Curlander, "Location of Spaceborne SAR Imagery", IEEE
- * Transactions on Geoscience and Remote Sensing GE-20(3), 1982. */
+ * Transactions on Geoscience and Remote Sensing GE-20(3), 1982.
+ *
+ * Nothing is kept between calls: any number of threads may call at a time. */
 
 /** Writes v / |v| to `unit`; where |v| is zero or not a number, (0, 0, 0). `unit` may be `v` itself. */
 QUO_BASE_API void make_versor(const double v[3], double unit[3]) QUO_NOEXCEPT;

@@ -10,7 +10,8 @@
  * Resampling: images of another size, samples between the samples, and phase ramps.
  *
  * Images are stored row after row; nx is the length of a row, ny the number of rows. Positions are in samples (x,
- * along the row) and rows (y), counted from 0. */
+ * along the row) and rows (y), counted from 0. One object serves one thread at a time; functions keep nothing
+ * between calls. */
 
 /** Changes the size of an image along one axis, by Fourier zero-padding or by linear interpolation. */
 class QUO_BASE_API interp {

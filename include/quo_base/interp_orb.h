@@ -9,7 +9,8 @@ QUO_BASE_C_BEGIN
  * Orbit polynomials: evaluation, and the fit through state vectors.
  *
  * A polynomial of n coefficients is stored highest degree first: at u seconds from its reference time its value is
- * c[n-1] + c[n-2] u + ... + c[0] u^(n-1). A trajectory is three of them, for x, y and z in metres. */
+ * c[n-1] + c[n-2] u + ... + c[0] u^(n-1). A trajectory is three of them, for x, y and z in metres.
+ * Nothing is kept between calls: any number of threads may call at a time. */
 
 /** Value of the polynomial at u. With n = 1 it is c[0]; with n = 0 it is 0 and c is not read. */
 QUO_BASE_API double POSMACRO(double u, const double* c, unsigned n) QUO_NOEXCEPT;

@@ -28,10 +28,13 @@ QUO_BASE_C_BEGIN
  * file, the later one counts.
  *
  * Strings are NUL-terminated byte strings; names are compared byte by byte. A null section, key or file stands for
- * one that is not there and cannot be made. All state is process-wide and unguarded: the library is to be called
- * from one thread at a time. When memory runs out the message "Memory allocation failure" (or "Memory
- * re-allocation failure", when a text outgrows its buffer) goes to the standard error stream and the process ends
- * with status 1. */
+ * one that is not there and cannot be made. When memory runs out the message "Memory allocation failure" (or
+ * "Memory re-allocation failure", when a text outgrows its buffer) goes to the standard error stream and the
+ * process ends with status 1.
+ *
+ * Threads: the files belong to the process, and any number of threads may call these functions at a time; they
+ * take turns. A value that GetSetProfileChar gives is only safe as long as no other thread changes or frees it;
+ * the typed accessors copy it out under the same turn. */
 
 /* ---- The store ---- */
 

@@ -6,7 +6,8 @@
 /** @file
  * The exception that the library throws, and an object layer over the report and the log (quo_base/ckerr.h).
  *
- * All report state is process-wide; objects of quorelReport hold nothing of their own. */
+ * All report state is process-wide; objects of quorelReport hold nothing of their own, and any number of threads
+ * may use them at a time. The public names below are read while no thread sets one. */
 
 /** The one exception type of the library: a message and a source position. Each text is cut at 511 bytes.
  *

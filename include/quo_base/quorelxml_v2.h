@@ -39,7 +39,8 @@
  * longer one is refused, never cut.
  *
  * Operations return 0, 1 (refused: missing field, bad argument, file that cannot be read or saved) or 7 (out of
- * memory) unless said otherwise. One object serves one thread at a time. */
+ * memory) unless said otherwise. One object serves one thread at a time. Different
+ * objects of one file are apart: the last that is saved stands. */
 
 namespace quo {
 class HeaderDocument;

@@ -10,7 +10,8 @@
  * The fast axis is range: two-way range time in seconds, counted in samples. The slow axis is azimuth: seconds
  * since 1 January 1985, counted in lines. Indices count from 0 at the start of an axis. Arithmetic never
  * overflows: counts and indices stop at the bounds of a 32-bit integer, and an axis whose interval is 0, or a time
- * that is no number, answers 0. */
+ * that is no number, answers 0. One object serves one thread at a time; its `const` members may run
+ * side by side. */
 
 /** One corner of a region: a time on either axis. */
 struct ROI_Time {

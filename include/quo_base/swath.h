@@ -14,7 +14,7 @@
  * Sections stand in channel 1 of an XML header, elements bear the members' names. -999 marks an unknown number.
  * Operations return 0, or a failing status with an entry in the report. A failed read leaves the members read so
  * far changed, the rest as they were. Vectors hold what was loaded or made; they are not part of the XML
- * sections. */
+ * sections. One object serves one thread at a time; its `const` members may run side by side. */
 
 /** Timing of a swath: its bursts and the changes of its sampling window. Section "SwathInfo"; in parameter files
  * also the key Swst_changes_bursts. */

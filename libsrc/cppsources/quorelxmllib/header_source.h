@@ -20,7 +20,11 @@ constexpr int kHeaderOptions = XML_PARSE_NOBLANKS | XML_PARSE_COMPACT | XML_PARS
  */
 class XmlErrors {
 public:
-    XmlErrors() noexcept : handler_{xmlStructuredError}, context_{xmlStructuredErrorContext} {
+    XmlErrors() noexcept {
+        static const bool ready = (xmlInitParser(), true);  // by one thread, before others parse
+        (void)ready;
+        handler_ = xmlStructuredError;
+        context_ = xmlStructuredErrorContext;
         xmlSetStructuredErrorFunc(this, [](void* self, xmlError* error) {
             auto& errors = *static_cast<XmlErrors*>(self);
             if (error->code == XML_ERR_NO_MEMORY) errors.out_of_memory_ = true;

@@ -80,8 +80,13 @@ std::uint32_t HeaderTree::keep(std::string_view text) {
 
 Node HeaderTree::add(Node parent, NodeKind kind, std::uint32_t name, std::uint32_t content) {
     const auto node = static_cast<Node>(records_.extend(1));
-    record(node) = {
-        .name = name, .attributes = 0, .content = content, .next = node, .parent = parent, .kind = kind};
+    Record& added = record(node);
+    added = {};
+    added.name = name;
+    added.content = content;
+    added.next = node;
+    added.parent = parent;
+    added.kind = kind;
     return node;
 }
 

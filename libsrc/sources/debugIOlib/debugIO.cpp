@@ -17,9 +17,6 @@ namespace {
 constexpr const char* kSource = "debugIO";
 constexpr std::array<std::size_t, 6> kElementSizes{4, 8, 8, 16, 2, 1};
 
-// The line last sent to the parent process.
-char waitbar_line[512];
-
 std::optional<std::size_t> dump_size(int type, int first, int second) {
     if (debug_element_size(type) == 0 || first < 0 || second < 0) return std::nullopt;
     return (quo::Checked<std::size_t>{debug_element_size(type)} * first * second).value();
@@ -29,14 +26,18 @@ bool write_whole(std::FILE* stream, const void* data, std::size_t size) {
     return size == 0 || std::fwrite(data, 1, size, stream) == size;
 }
 
-void send_line() { std::fputs(waitbar_line, stderr); }
+constexpr std::size_t kLineRoom = 512;
+
+/** A line to the parent process, in one piece whatever other threads send. */
+void send_line(const char* line) { std::fputs(line, stderr); }
 
 // "%f" whatever the locale, cut to the room that the longest float needs.
-void format_progress(float value) {
-    char digits[64];
+void send_progress(float value) {
+    char digits[64], line[kLineRoom];
     const auto end = std::to_chars(digits, digits + sizeof digits - 1, value, std::chars_format::fixed, 6);
     *end.ptr = '\0';
-    quo::format_bounded(waitbar_line, sizeof waitbar_line, "SET_WAITBAR: %s \n", digits);
+    quo::format_bounded(line, sizeof line, "SET_WAITBAR: %s \n", digits);
+    send_line(line);
 }
 
 }  // namespace
@@ -69,24 +70,23 @@ int write_debug(const char* file_name, const void* data, int type, int first, in
 int waitbar_open(const char* title) noexcept {
     const quo::ErrnoKept kept;  // nobody has to listen
     std::fputs("USE_WAITBAR\n", stderr);
-    quo::format_bounded(waitbar_line, sizeof waitbar_line, "SET_TITLE: %.499s\n", title ? title : "");
-    send_line();
+    char line[kLineRoom];
+    quo::format_bounded(line, sizeof line, "SET_TITLE: %.499s\n", title ? title : "");
+    send_line(line);
     std::fflush(stderr);
     return QUO_OK;
 }
 
 int waitbar_update(float value) noexcept {
     const quo::ErrnoKept kept;  // nobody has to listen
-    format_progress(value);
-    send_line();
+    send_progress(value);
     std::fflush(stderr);
     return QUO_OK;
 }
 
 int waitbar_close() noexcept {
     const quo::ErrnoKept kept;  // nobody has to listen
-    quo::copy_bounded(waitbar_line, "CLOSE_WAITBAR\n");
-    send_line();
+    send_line("CLOSE_WAITBAR\n");
     return QUO_OK;
 }
 

@@ -21,23 +21,24 @@ struct SharedCall {
 
 /** The ceremony of a tracked function: errno is reported and cleared and the name pushed on entry; leaving without
  * success() frees every block that the call and its callees still hold; the name is popped in any case. Nothing is
- * copied, formatted, allocated or written while all goes well. The frame is the function's first local. */
+ * copied, formatted, allocated, locked or written while all goes well. The frame is the function's first local, on
+ * the stack of the thread that runs it. */
 class CallFrame {
 public:
     /** `function` and `source` are literals: they are kept by address and shown in the report as they stand. */
     CallFrame(const char* function, const char* source, int line = __builtin_LINE()) noexcept
         : function_{function}, source_{source} {
         check_errno(line);
-        call_stack.push(function);
+        stack_.push(function);
     }
     CallFrame(const SharedCall& call, const char* source) noexcept
         : function_{call.function}, source_{source}, shared_line_{call.line} {
         check_errno();
-        call_stack.push(function_);
+        stack_.push(function_);
     }
     ~CallFrame() {
         if (!succeeded_) freeall_ckerr();
-        call_stack.pop();
+        stack_.pop();
     }
     CallFrame(CallFrame&&) = delete;
 
@@ -79,6 +80,7 @@ private:
     }
     [[nodiscard]] int line_of(int line) const noexcept { return shared_line_ != 0 ? shared_line_ : line; }
 
+    CallStack& stack_ = call_stack();
     const char *function_, *source_;
     int shared_line_ = 0;
     bool succeeded_ = false;

@@ -2,12 +2,14 @@
 #define QUO_CALL_STACK_H
 
 #include <algorithm>
+#include <atomic>
 #include <cstddef>
 #include <cstdint>
 
 namespace quo {
 
 struct CallRecord;
+struct TrackedBlocks;
 
 /** Calls deeper than the last slot share it: their depth keeps counting, their names and counters do not. */
 inline constexpr std::uint32_t kCallSlots = 64;
@@ -22,18 +24,23 @@ struct RunningCall {
     std::uint16_t entered;  ///< functions entered at this depth since tracking began, modulo 65536
 };
 
-/** The calls that are running. Depth 0 is main(). Nothing here allocates, copies names or makes system calls, so
- * that a call that succeeds pays next to nothing for being tracked. */
+/** The calls that run on one thread. Depth 0 is main(), also where a thread has another beginning. Nothing here
+ * allocates, copies names, locks or makes system calls, so that a call that succeeds pays next to nothing for
+ * being tracked. */
 struct CallStack {
-    bool tracking;
     std::uint32_t depth;
     std::uint64_t calls;  ///< serial of the latest call; never reset, so that serials stay unique
     RunningCall slots[kCallSlots];
-    std::uint32_t muted;  ///< nothing is added to the report while this is above 0
-    int system_error;     ///< the latest that was reported, until somebody asks
+    std::uint32_t muted;    ///< nothing is added to the report while this is above 0
+    int system_error;       ///< the latest that was reported, until somebody asks
+    TrackedBlocks* blocks;  ///< what the thread's allocations are entered in; null before the first
+    char copied_names[kCallSlots][kCallNameRoom];  ///< of the slots whose names came from outside
 
     [[nodiscard]] std::uint32_t slot() const noexcept { return std::min(depth, kCallSlots - 1); }
     [[nodiscard]] RunningCall& running() noexcept { return slots[slot()]; }
+
+    /** Leaves all functions and forgets how many there were. */
+    void empty() noexcept;
 
     /** Enters a function. `name` is kept by address: a literal, or text that stands until the call returns. While
      * tracking is off nobody looks, and turning it on empties the stack. */
@@ -50,8 +57,17 @@ struct CallStack {
     }
 };
 
-/** The one stack of the process. */
-extern CallStack call_stack;
+/** Whether calls and blocks are tracked, in the whole process. */
+extern constinit std::atomic<bool> tracking;
+
+/** This thread's stack once it has one. A pointer in the thread's first storage costs one access; the stack itself
+ * would not find room there when the library is loaded into a running program. */
+extern constinit thread_local CallStack* own_call_stack [[gnu::tls_model("initial-exec")]];
+
+/** Gives the thread a stack, until it ends. Where there is no memory for it, the process ends. */
+[[gnu::cold]] CallStack& make_call_stack() noexcept;
+
+inline CallStack& call_stack() noexcept { return own_call_stack ? *own_call_stack : make_call_stack(); }
 
 }  // namespace quo
 

@@ -6,6 +6,7 @@
 #include <cstdarg>
 #include <cstdio>
 #include <cstring>
+#include <mutex>
 
 #include "quo_base/ckerr.h"
 #include "sarutillib/ground/bounded_text.h"
@@ -31,6 +32,9 @@ public:
 private:
     char text_[kMessageRoom];
 };
+
+/** Held while a name is set and the file of that name is opened: two threads do not mix their names. */
+std::mutex naming;
 
 bool report_is_open() noexcept { return ckflg_report() >= 1; }
 
@@ -71,6 +75,7 @@ char quorelReport::progressFilename[512];
 quorelReport::quorelReport() noexcept { init_ckerr_locking(); }
 
 quorelReport::quorelReport(const char* name, int level) noexcept {
+    const std::lock_guard guard{naming};
     init_ckerr_locking();
     if (report_is_open()) {
         add_plain(QUO_WARNING, "Cannot change report FILENAME!");
@@ -132,6 +137,7 @@ void quorelReport::addLog(const char* format, ...) noexcept {
 }
 
 void quorelReport::setLevel(int level) noexcept {
+    const std::lock_guard guard{naming};
     if (report_is_open()) {
         add_plain(QUO_WARNING, "Cannot change report LEVEL!");
     } else if (reportFilename[0] != '\0') {
@@ -142,6 +148,7 @@ void quorelReport::setLevel(int level) noexcept {
 int quorelReport::getLevel() const noexcept { return ckflg_report(); }
 
 void quorelReport::setReportName(const char* name) noexcept {
+    const std::lock_guard guard{naming};
     if (reportFilename[0] != '\0') {
         add_plain(QUO_WARNING, "Cannot change report FILENAME!");
         return;
@@ -154,16 +161,19 @@ void quorelReport::setReportName(const char* name) noexcept {
 const char* quorelReport::getReportName() const noexcept { return reportFilename; }
 
 void quorelReport::setLogName(const char* name) noexcept {
+    const std::lock_guard guard{naming};
     quo::copy_bounded(logFilename, quo::text_or_empty(name));
     init_ckerr_locking();
     init_log(logFilename, kTitle, kDefaultLevel);
 }
 
 void quorelReport::setProgressName(const char* name) noexcept {
+    const std::lock_guard guard{naming};
     quo::copy_bounded(progressFilename, quo::text_or_empty(name));
 }
 
 int quorelReport::progress_update(float percentage, const char* text) noexcept {
+    const std::lock_guard guard{naming};
     quo::Stream stream{std::fopen(progressFilename, "wb")};
     if (!stream) {
         errno = 0;

@@ -1,9 +1,11 @@
 #include "diagnosticslib/report.h"
 
+#include <atomic>
 #include <climits>
 #include <cstdio>
 #include <cstring>
 #include <ctime>
+#include <mutex>
 #include <optional>
 #include <utility>
 
@@ -18,15 +20,17 @@ constexpr char kRule[] = "======================================================
 static_assert(sizeof kRule == 78 + 1);
 constexpr std::size_t kTitleRoom = 4096;
 
-/** The report or the log. */
+/** The report or the log. The level can be asked for at any time, by any thread; all else waits for `writing`, so
+ * that every entry is whole and every number given once. */
 struct Channel {
     std::FILE* stream;
-    int level;
+    std::atomic<int> level;
     int entries;
 
     [[nodiscard]] bool is_open() const noexcept { return level >= 1 && level <= 3; }
 };
 
+std::mutex writing;
 Channel report, log_file;
 
 // Report and log tell of one run and share its title and start time: opening the log after the report moves the
@@ -68,9 +72,11 @@ std::optional<int> open_channel(Channel& channel, const char* file_name, const c
     if (!stream) return 0;
     // A file may still be open behind a level that was forced to 0; all of it is on the disk already.
     if (channel.stream) close_channel(channel);
-    channel = {stream, level, 0};
+    channel.stream = stream;
+    channel.entries = 0;
     std::time(&shared_start);
     quo::copy_bounded(shared_title, shown(title));
+    channel.level = level;
     return std::nullopt;
 }
 
@@ -131,6 +137,7 @@ void write_entry(std::FILE* stream, int number, const Entry& entry) noexcept {
 void quo::silence_report_and_log() noexcept { report.level = log_file.level = 0; }
 
 extern "C" int init_report(const char* file_name, const char* title, int level) noexcept {
+    const std::lock_guard guard{writing};
     if (const auto answer = open_channel(report, file_name, title, level)) return *answer;
     const quo::ErrnoKept kept;
     std::fprintf(report.stream, "\n%s\n QUOREL report (level %d) - %s - Started on %s%s\n", kRule, level,
@@ -139,10 +146,12 @@ extern "C" int init_report(const char* file_name, const char* title, int level) 
 }
 
 extern "C" int init_log(const char* file_name, const char* title, int level) noexcept {
+    const std::lock_guard guard{writing};
     return open_channel(log_file, file_name, title, level).value_or(1);
 }
 
 extern "C" int exit_report(void) noexcept {
+    const std::lock_guard guard{writing};
     if (!report.is_open()) return one_below(report.level);
     const quo::ErrnoKept kept;
     quo::silence_report_and_log();
@@ -160,8 +169,10 @@ extern "C" int set_flg_report(int level) noexcept { return report.level = level;
 
 extern "C" void quo_add_report(const char* message, int kind, int line, const char* function,
                                const char* file) noexcept {
-    if (!report.is_open() || quo::call_stack.muted > 0) return;
+    if (!report.is_open() || quo::call_stack().muted > 0) return;
     const quo::ErrnoKept kept;
+    const std::lock_guard guard{writing};
+    if (!report.is_open()) return;  // closed by another thread meanwhile
     const Entry entry{shown(message), kind, line, shown(function), shown(file)};
     if (report.stream) write_entry(report.stream, report.entries, entry);  // none behind a level that was forced
     if (kind == QUO_ERROR || kind == QUO_MESSAGE) {
@@ -172,6 +183,7 @@ extern "C" void quo_add_report(const char* message, int kind, int line, const ch
 }
 
 extern "C" int quo_add_log(const char* text) noexcept {
+    const std::lock_guard guard{writing};
     if (!log_file.stream) return EOF;
     const quo::ErrnoKept kept;
     std::fprintf(log_file.stream, "\n%d) %s\n", log_file.entries++, shown(text));
@@ -179,10 +191,10 @@ extern "C" int quo_add_log(const char* text) noexcept {
 }
 
 extern "C" void quo_check(int error_number, int line, const char* function, const char* file) noexcept {
-    if (error_number != 0) quo::call_stack.system_error = error_number;
+    if (error_number != 0) quo::call_stack().system_error = error_number;
     if (error_number == 0 || !report.is_open()) return;
     const quo::ErrnoKept kept;
     quo_add_report(std::strerror(error_number), QUO_ERROR, line, function, file);
 }
 
-extern "C" int quo_take_system_error(void) noexcept { return std::exchange(quo::call_stack.system_error, 0); }
+extern "C" int quo_take_system_error(void) noexcept { return std::exchange(quo::call_stack().system_error, 0); }

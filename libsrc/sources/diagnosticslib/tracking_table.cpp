@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <bit>
 #include <iterator>
+#include <span>
 
 #include "sarutillib/ground/bounded_text.h"
 
@@ -95,7 +96,9 @@ std::uint32_t TrackingTable::lowest_since(std::uint64_t serial) const noexcept {
     return lowest;
 }
 
+// Threads that are running calls still know the records they have made, by their serials.
 void TrackingTable::clear() noexcept {
+    for (CallRecord& record : std::span{records_}.first(records_taken_)) record.serial = kNoCall;
     count_ = null_count_ = records_taken_ = 0;
     newest_ = unused_ = nullptr;
     std::fill(std::begin(cells_), std::end(cells_), Cell{});

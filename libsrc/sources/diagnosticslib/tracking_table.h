@@ -19,7 +19,7 @@ struct CallRecord {
     char name[kCallNameRoom];
 };
 
-/** The blocks that the tracked allocator has handed out and not yet taken back.
+/** The blocks that the tracked allocator has handed out on one thread and not yet taken back.
  *
  * The entries form a dense array. Removing one moves the last entry into its place, so that the order is not that
  * of allocation; the order is observable (leak report, choice among null entries) and kept whatever the index
@@ -62,6 +62,7 @@ private:
     static constexpr std::uint32_t kCellMask = kCells - 1;
     static constexpr std::uint32_t kBits = 64;
     static constexpr std::uint32_t kNone = ~0U;
+    static constexpr std::uint64_t kNoCall = ~std::uint64_t{0};
 
     /** Zero is the empty cell. */
     struct Cell {

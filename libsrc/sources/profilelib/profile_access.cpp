@@ -8,6 +8,7 @@
 
 #include "diagnosticslib/call_frame.h"
 #include "profilelib/out_of_memory.h"
+#include "profilelib/profile_store.h"
 #include "quo_base/profile.h"
 #include "sarutillib/ground/bounded_text.h"
 #include "sarutillib/ground/number_text.h"
@@ -21,7 +22,8 @@ constexpr int kFloatDigits = 7;
 constexpr int kDoubleDigits = 15;
 constexpr std::string_view kBetweenRows = "\n\t";
 
-/** One call of an accessor: its frame, and the place in the parameter files that its reports name. */
+/** One call of an accessor: its frame, and the place in the parameter files that its reports name. Until it ends,
+ * no other thread changes or frees the value. */
 class Access {
 public:
     Access(const char* function, const char* section, const char* key, const char* file,
@@ -57,6 +59,7 @@ private:
     }
 
     CallFrame frame_;
+    std::unique_lock<std::recursive_mutex> access_ = profile_access();
     const char *function_, *section_, *key_, *file_;
 };
 

@@ -4,6 +4,7 @@
 #include <cerrno>
 #include <cstdint>
 #include <cstdio>
+#include <mutex>
 #include <utility>
 
 #include "diagnosticslib/saved_in_place.h"
@@ -45,12 +46,13 @@ ProfileContent* ProfileStore::loaded(std::string_view path) {
 
 int ProfileStore::sync(std::string_view path) {
     const File* const file = find(path);
-    return file ? write(*file) : 0;
+    return file && !looks_.contains(path) ? write(*file) : 0;
 }
 
 int ProfileStore::sync_all() {
     int status = 0;
-    for (const File& file : files_) status = write(file);
+    for (const File& file : files_)
+        if (!looks_.contains(file.path)) status = write(file);
     // Inverted: callers of this form know -1 as its success.
     return status == 0 ? -1 : 0;
 }
@@ -102,22 +104,40 @@ int ProfileStore::write(const File& file) {
 }
 
 bool ProfileStore::begin_look(std::string_view path) {
-    if (find(path) || std::ranges::find(looked_into_, path) != looked_into_.end()) return false;
-    looked_into_.push_back(path);
+    const auto looks = looks_.find(path);
+    if (looks == looks_.end() && find(path)) return false;
+    if (looks != looks_.end()) return ++looks->second > 0;
+    looks_.emplace(path, 1);
     return true;
 }
 
 void ProfileStore::end_look(std::string_view path) {
+    const auto looks = looks_.find(path);
+    if (looks == looks_.end() || --looks->second > 0) return;
     free(path);
-    std::erase(looked_into_, path);
+    looks_.erase(looks);
+}
+
+void ProfileStore::keep(std::string_view path) {
+    const auto looks = looks_.find(path);
+    if (looks != looks_.end()) looks_.erase(looks);
+}
+
+std::unique_lock<std::recursive_mutex> profile_access() noexcept {
+    // Recursive, since accessors call each other; never destroyed, as the store.
+    static auto& lock = *new std::recursive_mutex;
+    return std::unique_lock{lock};
 }
 
 ProfileLook::ProfileLook(const char* file) noexcept {
+    const auto access = profile_access();
     if (file && or_end_process(kNoMemory, [&] { return ProfileStore::instance().begin_look(file); })) file_ = file;
 }
 
 ProfileLook::~ProfileLook() {
-    if (file_) ProfileStore::instance().end_look(file_);
+    if (!file_) return;
+    const auto access = profile_access();
+    ProfileStore::instance().end_look(file_);
 }
 
 }  // namespace quo
@@ -127,20 +147,24 @@ using quo::ProfileStore;
 
 extern "C" const char* GetSetProfileChar(int write, const char* section, const char* key, const char* value,
                                          const char* file) noexcept {
+    const auto access = quo::profile_access();
     if (!section || !key || !file || (write && !value)) return nullptr;
     return quo::or_end_process(quo::kNoMemory, [&] {
         ProfileContent& content = ProfileStore::instance().load(file);
+        if (write) ProfileStore::instance().keep(file);
         return write ? content.set(section, key, value) : content.find(section, key);
     });
 }
 
 extern "C" int SyncProfile(const char* file) noexcept {
+    const auto access = quo::profile_access();
     return quo::or_end_process(quo::kNoMemory, [&] {
         return file ? ProfileStore::instance().sync(file) : ProfileStore::instance().sync_all();
     });
 }
 
 extern "C" void FreeProfile(const char* file) noexcept {
+    const auto access = quo::profile_access();
     quo::or_end_process(quo::kNoMemory, [&] {
         if (file)
             ProfileStore::instance().free(file);
@@ -150,21 +174,27 @@ extern "C" void FreeProfile(const char* file) noexcept {
 }
 
 extern "C" void DelProfileKey(const char* section, const char* key, const char* file) noexcept {
+    const auto access = quo::profile_access();
     quo::or_end_process(quo::kNoMemory, [&] {
         ProfileContent* const content = file ? ProfileStore::instance().loaded(file) : nullptr;
         if (!content)
             std::fputs("Warning: DelProfileKey called before init\n", stderr);
-        else if (section && key)
+        else if (section && key) {
+            ProfileStore::instance().keep(file);
             content->erase_key(section, key);
+        }
     });
 }
 
 extern "C" void DelProfileSection(const char* section, const char* file) noexcept {
+    const auto access = quo::profile_access();
     quo::or_end_process(quo::kNoMemory, [&] {
         ProfileContent* const content = file ? ProfileStore::instance().loaded(file) : nullptr;
         if (!content)
             std::fputs("Warning: DelProfileSection called before init\n", stderr);
-        else if (section)
+        else if (section) {
+            ProfileStore::instance().keep(file);
             content->erase_section(section);
+        }
     });
 }

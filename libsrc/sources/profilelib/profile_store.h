@@ -1,11 +1,13 @@
 #ifndef QUO_PROFILE_STORE_H
 #define QUO_PROFILE_STORE_H
 
+#include <functional>
 #include <list>
+#include <map>
+#include <mutex>
 #include <string>
 #include <string_view>
 #include <unordered_map>
-#include <vector>
 
 #include "profilelib/profile_content.h"
 
@@ -14,7 +16,7 @@ namespace quo {
 /** The parameter files that the process has touched. Members may throw std::bad_alloc. */
 class ProfileStore {
 public:
-    /** The one store of the process. */
+    /** The one store of the process. Whoever uses it, or a value in it, holds profile_access() meanwhile. */
     static ProfileStore& instance();
 
     /** The content of a file, which is read from the disk if it is not in memory. */
@@ -30,10 +32,13 @@ public:
     void free(std::string_view path);
     void free_all();
 
-    /** For ProfileLook. True, unless the file is in memory or being looked into already; end_look() then forgets
-     * the file, in whatever order looks end. `path` stands until then. */
+    /** For ProfileLook. True, unless the file is in memory for another reason; each look is then ended by
+     * end_look(). The last to end forgets
+     * the file, unless somebody has changed what stands in it. Until then it is not written back. */
     bool begin_look(std::string_view path);
     void end_look(std::string_view path);
+    /** Notes that the file is not only looked into. */
+    void keep(std::string_view path);
 
 private:
     struct File {
@@ -48,9 +53,12 @@ private:
 
     std::list<File> files_;  // in the order of loading
     std::unordered_map<std::string_view, std::list<File>::iterator> by_path_;
-    std::vector<std::string_view> looked_into_;  // each by the look that began it
-    File* current_ = nullptr;                    // the one used last, which most calls ask for again
+    std::map<std::string, int, std::less<>> looks_;  // how many there are into a file
+    File* current_ = nullptr;                        // the one used last, which most calls ask for again
 };
+
+/** Keeps other threads off the store as long as the result stands; a thread that has it may take it again. */
+[[nodiscard]] std::unique_lock<std::recursive_mutex> profile_access() noexcept;
 
 }  // namespace quo
 

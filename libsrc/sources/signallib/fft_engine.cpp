@@ -2,8 +2,10 @@
 
 #include <dlfcn.h>
 
+#include <atomic>
 #include <cstdlib>
 #include <memory>
+#include <mutex>
 #include <string>
 
 #include "diagnosticslib/errno_kept.h"
@@ -53,7 +55,8 @@ std::string own_folder() {
 FftEngine* mkl() { return load_mkl_engine(setting("QUO_MKL_LIBRARY")); }
 FftEngine* fftw() { return load_fftw_engine(setting("QUO_FFTW_MODULE")); }
 
-FftEngine* chosen = nullptr;
+std::mutex choosing;
+std::atomic<FftEngine*> chosen{nullptr};
 
 /** Of each thread, as errno is: the plans of two threads may fail at the same time. */
 thread_local char error_text[512];
@@ -77,13 +80,15 @@ EngineOrder engine_order(std::string_view choice, bool makers_processor) noexcep
 }
 
 FftEngine* fft_engine() noexcept {
-    if (chosen) return chosen;
+    if (FftEngine* const engine = chosen) return engine;
+    const std::lock_guard guard{choosing};
+    if (FftEngine* const engine = chosen) return engine;
     const ErrnoKept kept;
     const char* choice = setting("QUO_FFT_ENGINE");
     const EngineOrder order = engine_order(choice ? choice : "auto", is_makers_processor());
-    chosen = order.first();
-    if (!chosen && order.second) chosen = order.second();
-    return chosen;
+    FftEngine* engine = order.first();
+    if (!engine && order.second) engine = order.second();
+    return chosen = engine;
 }
 
 void forget_fft_engine() noexcept { chosen = nullptr; }

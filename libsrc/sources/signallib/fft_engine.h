@@ -41,7 +41,8 @@ public:
     virtual ~FftBatch() = default;
 
     /** Transforms unscaled, from `in` to `out`: the same for a batch in place, apart otherwise, aligned as floats
-     * at least. False when the engine failed, which fills `why`. */
+     * at least. False when the engine failed, which fills `why`. Any number of threads may run a batch at a time.
+     */
     virtual bool run(const float* in, float* out, FftFailure& why) noexcept = 0;
 };
 
@@ -56,7 +57,8 @@ public:
     [[nodiscard]] virtual const char* name() const noexcept = 0;
     /** Columns of so many rows and more are faster through a tile of neighbouring columns. */
     [[nodiscard]] virtual int tiled_from() const noexcept = 0;
-    /** Null when the batch cannot be had, which fills `why`. Takes memory of its own to measure on. */
+    /** Null when the batch cannot be had, which fills `why`. Takes memory of its own to measure on. Any thread may
+     * ask. */
     [[nodiscard]] virtual std::unique_ptr<FftBatch> make(const FftGeometry& geometry,
                                                          FftFailure& why) noexcept = 0;
 };

@@ -4,9 +4,11 @@
 #include <bit>
 #include <cstring>
 #include <tuple>
+#include <utility>
 
 #include "quo_base/fft.h"
 #include "signallib/memory_room.h"
+#include "signallib/spare_floats.h"
 
 namespace quo {
 namespace {
@@ -111,23 +113,23 @@ public:
         : FftTransform{columns, std::min(width, columns.count)},
           batches_{engine, tile_geometry(columns, block_), columns.count},
           bytes_{static_cast<std::size_t>(columns.length * tile_pitch(block_)) * 2 * sizeof(float)},
-          tile_{nullptr, &fft_free} {
-        if (!batches_.ready()) return;
-        if (has_room({bytes_, bytes_})) tile_.reset(static_cast<float*>(fft_malloc(bytes_)));
-        if (!tile_) note_fft_error(engine, columns.length, {.bytes = bytes_});
+          engine_{engine},
+          fits_{batches_.ready() && has_room({bytes_, bytes_})},
+          tiles_{fits_ ? bytes_ / sizeof(float) : 0} {
+        if (batches_.ready() && !fits_) note_fft_error(engine_, geometry_.length, {.bytes = bytes_});
     }
-    [[nodiscard]] bool ready() const { return tile_ != nullptr; }
+    [[nodiscard]] bool ready() const { return fits_; }
     [[nodiscard]] std::size_t held_bytes() const noexcept override { return bytes_; }
 
     bool run(const float* in, float* out, int first, int count, FftFactors factors) noexcept override {
-        for (int k = first; k < first + count; k += block_) {
-            const int width = std::min(block_, geometry_.count - k);
-            fill(in + 2 * std::ptrdiff_t{k}, width);
-            if (!batches_.run(width, tile_.get(), tile_.get())) return false;
-            multiply_rows(tile_.get(), geometry_.length, 2 * std::ptrdiff_t{width}, pitch(), factors);
-            empty(out + 2 * std::ptrdiff_t{k}, width);
-        }
-        return true;
+        Floats tile = tiles_.take();
+        if (!tile) note_fft_error(engine_, geometry_.length, {.bytes = bytes_});
+        bool done = tile != nullptr;
+        for (int k = first; done && k < first + count; k += block_)
+            done = run_block(in + 2 * std::ptrdiff_t{k}, out + 2 * std::ptrdiff_t{k},
+                             std::min(block_, geometry_.count - k), tile.get(), factors);
+        tiles_.give_back(std::move(tile));
+        return done;
     }
 
 private:
@@ -142,27 +144,36 @@ private:
     }
     [[nodiscard]] std::ptrdiff_t pitch() const noexcept { return 2 * tile_pitch(block_); }
 
+    [[nodiscard]] bool run_block(const float* in, float* out, int width, float* tile,
+                                 FftFactors factors) const noexcept {
+        fill(in, width, tile);
+        if (!batches_.run(width, tile, tile)) return false;
+        multiply_rows(tile, geometry_.length, 2 * std::ptrdiff_t{width}, pitch(), factors);
+        empty(tile, width, out);
+        return true;
+    }
+
     /** The rows are too far apart for the processor to see them coming. */
-    void fill(const float* from, int width) noexcept {
+    void fill(const float* from, int width, float* to) const noexcept {
         constexpr std::ptrdiff_t kAhead = 16, kLineFloats = 16;
         const std::ptrdiff_t floats = 2 * std::ptrdiff_t{width}, step = 2 * geometry_.stride;
-        float* to = tile_.get();
         for (int row = 0; row < geometry_.length; ++row, from += step, to += pitch()) {
             const float* const next = from + std::min<std::ptrdiff_t>(kAhead, geometry_.length - 1 - row) * step;
             for (std::ptrdiff_t k = 0; k < floats; k += kLineFloats) __builtin_prefetch(next + k);
             std::memcpy(to, from, static_cast<std::size_t>(floats) * sizeof(float));
         }
     }
-    void empty(float* to, int width) const noexcept {
+    void empty(const float* from, int width, float* to) const noexcept {
         const std::size_t bytes = 2 * sizeof(float) * static_cast<std::size_t>(width);
-        const float* from = tile_.get();
         for (int row = 0; row < geometry_.length; ++row, from += pitch(), to += 2 * geometry_.stride)
             std::memcpy(to, from, bytes);
     }
 
     BlockBatches batches_;
     std::size_t bytes_;
-    std::unique_ptr<float, void (*)(void*)> tile_;
+    FftEngine& engine_;
+    bool fits_;
+    SpareFloats tiles_;
 };
 
 /** Narrow tiles waste half of each access to memory; of very long columns wide ones would leave even the last

@@ -14,7 +14,8 @@ struct FftFactors {
 };
 
 /** A batch cut into blocks for the cache, made ready by an engine: rows a few at a time, columns in groups or
- * through a tile. Results are multiplied while they are still in the cache. */
+ * through a tile. Results are multiplied while they are still in the cache. Any number of threads may run it at a
+ * time, on different data. */
 class FftTransform {
 public:
     FftTransform(const FftTransform&) = delete;

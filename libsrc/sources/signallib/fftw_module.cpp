@@ -5,24 +5,31 @@
 #include <algorithm>
 #include <cstdlib>
 #include <cstring>
+#include <mutex>
 #include <new>
 #include <utility>
 
 #include "signallib/fft_engine.h"
 #include "signallib/memory_room.h"
+#include "signallib/spare_floats.h"
 
 namespace {
 
+using quo::allocate_floats;
 using quo::FftBatch;
 using quo::FftDomain;
 using quo::FftEngine;
 using quo::FftFailure;
 using quo::FftGeometry;
+using quo::Floats;
 using quo::MemoryNeed;
+using quo::SpareFloats;
 
 /** Ends measuring at very long transforms; the batches that are asked for are measured well within it. */
 constexpr double kPlanningSeconds = 10.0;
-constexpr std::size_t kAlignment = 64;
+
+/** FFTW makes and destroys plans on one thread at a time; it runs them on any number. */
+std::mutex planner;
 
 struct Plan {
     Plan() noexcept = default;
@@ -33,7 +40,9 @@ struct Plan {
         return *this;
     }
     ~Plan() {
-        if (plan_) fftwf_destroy_plan(plan_);
+        if (!plan_) return;
+        const std::lock_guard guard{planner};
+        fftwf_destroy_plan(plan_);
     }
     explicit operator bool() const noexcept { return plan_ != nullptr; }
     [[nodiscard]] fftwf_plan get() const noexcept { return plan_; }
@@ -41,20 +50,6 @@ struct Plan {
 private:
     fftwf_plan plan_ = nullptr;
 };
-
-struct Free {
-    void operator()(float* block) const noexcept { std::free(block); }
-};
-using Floats = std::unique_ptr<float, Free>;
-
-/** Memory that is not touched: of a strided batch only the pages in use come into being. */
-Floats allocate(std::size_t floats) noexcept {
-    std::size_t bytes = 0;
-    if (__builtin_mul_overflow(floats, sizeof(float), &bytes) ||
-        __builtin_add_overflow(bytes, kAlignment - 1, &bytes))
-        return nullptr;
-    return Floats{static_cast<float*>(std::aligned_alloc(kAlignment, bytes / kAlignment * kAlignment))};
-}
 
 /** FFTW ends the process when an allocation of its own fails, while it plans and while it runs: what it may take
  * is looked for before. These bounds were measured, on lengths of all kinds and batches of all shapes: the most
@@ -104,8 +99,8 @@ Plan measure(const FftGeometry& geometry, unsigned flags, FftFailure& why) noexc
     const MemoryNeed need{scratches * floats * sizeof(float) + fftw.planning(),
                           scratches * fftw.batch() + fftw.planning()};
     if (!has_room_for(need, why)) return {};
-    const Floats in = allocate(floats);
-    const Floats apart = geometry.in_place ? nullptr : allocate(floats);
+    const Floats in = allocate_floats(floats);
+    const Floats apart = geometry.in_place ? nullptr : allocate_floats(floats);
     if (!in || (!geometry.in_place && !apart)) {
         why.bytes = need.touched;
         return {};
@@ -114,6 +109,7 @@ Plan measure(const FftGeometry& geometry, unsigned flags, FftFailure& why) noexc
     auto* const to = geometry.in_place ? from : reinterpret_cast<fftwf_complex*>(apart.get());
     const fftwf_iodim64 transform{geometry.length, geometry.stride, geometry.stride};
     const fftwf_iodim64 batch{geometry.count, geometry.distance, geometry.distance};
+    const std::lock_guard guard{planner};
     fftwf_set_timelimit(kPlanningSeconds);
     return Plan{fftwf_plan_guru64_dft(1, &transform, 1, &batch, from, to,
                                       geometry.forward ? FFTW_FORWARD : FFTW_BACKWARD, FFTW_MEASURE | flags)};
@@ -129,8 +125,7 @@ public:
         float* const from = const_cast<float*>(in);  // kept by transforms that are not in place
         const bool aligned = fftwf_alignment_of(from) == 0 && fftwf_alignment_of(out) == 0;
         // Few callers need the slower plan for samples that start between two vectors: it is made for the first.
-        if (!aligned && !unaligned_) unaligned_ = measure(geometry_, FFTW_UNALIGNED, why);
-        const Plan& plan = aligned ? aligned_ : unaligned_;
+        const Plan& plan = aligned ? aligned_ : unaligned(why);
         if (!plan || !has_room_for({running_, running_}, why)) return false;
         fftwf_execute_dft(plan.get(), reinterpret_cast<fftwf_complex*>(from),
                           reinterpret_cast<fftwf_complex*>(out));
@@ -138,41 +133,51 @@ public:
     }
 
 private:
+    const Plan& unaligned(FftFailure& why) noexcept {
+        const std::lock_guard guard{making_unaligned_};
+        if (!unaligned_) unaligned_ = measure(geometry_, FFTW_UNALIGNED, why);
+        return unaligned_;
+    }
+
     FftGeometry geometry_;
     std::size_t running_;
+    std::mutex making_unaligned_;
     Plan aligned_, unaligned_;
 };
 
-/** Real transforms pass through aligned buffers: samples on one side, a half spectrum of length / 2 + 1 complex
- * values on the other, which FFTW does not pack. */
+/** Real transforms pass through aligned room: rows of samples, and behind them a half spectrum of length / 2 + 1
+ * complex values, which FFTW does not pack. */
 class RealBatch final : public FftBatch {
 public:
     RealBatch(const FftGeometry& geometry, FftFailure& why) noexcept
         : geometry_{geometry},
           length_{static_cast<std::size_t>(geometry.length)},
           pitch_{(length_ + 2 + 15) / 16 * 16},
-          group_{geometry.stride == 1 ? 1 : std::min(kGroup, geometry.count)} {
-        const std::size_t groups = pitch_ * static_cast<std::size_t>(group_);
-        const std::size_t need = (groups + pitch_) * sizeof(float) + appetite().planning();
-        if (!has_room_for({need, need}, why)) return;
-        samples_ = allocate(groups);
-        spectrum_ = allocate(pitch_);
-        if (samples_ && spectrum_) plan_ = measure_one();
-        if (!samples_ || !spectrum_) why.bytes = need;
+          group_{geometry.stride == 1 ? 1 : std::min(kGroup, geometry.count)},
+          room_{has_room_for(all_memory(), why) ? floats() : 0} {
+        if (why.bytes != 0) return;
+        Floats room = room_.take();
+        if (room) plan_ = measure_one(room.get());
+        if (!room) why.bytes = all_memory().touched;
+        room_.give_back(std::move(room));
     }
     [[nodiscard]] bool ready() const noexcept { return static_cast<bool>(plan_); }
 
     bool run(const float* in, float* out, FftFailure& why) noexcept override {
         const std::size_t running = appetite().running();
         if (!has_room_for({running, running}, why)) return false;
-        for (int first = 0; first < geometry_.count; first += group_) {
+        Floats room = room_.take();
+        if (!room) why.bytes = floats() * sizeof(float);
+        for (int first = 0; room && first < geometry_.count; first += group_) {
             const int width = std::min(group_, geometry_.count - first);
             const auto offset = first * geometry_.distance;
-            gather(in + offset, width);
-            for (int k = 0; k < width; ++k) transform(row(k));
-            scatter(out + offset, width);
+            gather(in + offset, width, room.get());
+            for (int k = 0; k < width; ++k) transform(row(room.get(), k), row(room.get(), group_));
+            scatter(room.get(), width, out + offset);
         }
-        return true;
+        const bool done = room != nullptr;
+        room_.give_back(std::move(room));
+        return done;
     }
 
 private:
@@ -184,34 +189,39 @@ private:
         one.count = 1;
         return FftwAppetite{one};
     }
+    [[nodiscard]] std::size_t floats() const noexcept { return pitch_ * (static_cast<std::size_t>(group_) + 1); }
+    [[nodiscard]] MemoryNeed all_memory() const noexcept {
+        const std::size_t need = floats() * sizeof(float) + appetite().planning();
+        return {need, need};
+    }
 
-    [[nodiscard]] Plan measure_one() noexcept {
-        auto* const half = reinterpret_cast<fftwf_complex*>(spectrum_.get());
+    [[nodiscard]] Plan measure_one(float* room) const noexcept {
+        auto* const half = reinterpret_cast<fftwf_complex*>(row(room, group_));
+        const std::lock_guard guard{planner};
         fftwf_set_timelimit(kPlanningSeconds);
-        return Plan{geometry_.forward
-                        ? fftwf_plan_dft_r2c_1d(geometry_.length, samples_.get(), half, FFTW_MEASURE)
-                        : fftwf_plan_dft_c2r_1d(geometry_.length, half, samples_.get(), FFTW_MEASURE)};
+        return Plan{geometry_.forward ? fftwf_plan_dft_r2c_1d(geometry_.length, room, half, FFTW_MEASURE)
+                                      : fftwf_plan_dft_c2r_1d(geometry_.length, half, room, FFTW_MEASURE)};
     }
-    [[nodiscard]] float* row(int k) const noexcept {
-        return samples_.get() + static_cast<std::size_t>(k) * pitch_;
-    }
-
-    void gather(const float* in, int width) noexcept {
-        if (geometry_.stride == 1 && width == 1) return void(std::copy_n(in, length_, row(0)));
-        for (std::size_t i = 0; i < length_; ++i)
-            for (int k = 0; k < width; ++k)
-                row(k)[i] = in[static_cast<std::ptrdiff_t>(i) * geometry_.stride + k * geometry_.distance];
-    }
-    void scatter(float* out, int width) const noexcept {
-        if (geometry_.stride == 1 && width == 1) return void(std::copy_n(row(0), length_, out));
-        for (std::size_t i = 0; i < length_; ++i)
-            for (int k = 0; k < width; ++k)
-                out[static_cast<std::ptrdiff_t>(i) * geometry_.stride + k * geometry_.distance] = row(k)[i];
+    /** The row behind those of the group is the half spectrum. */
+    [[nodiscard]] float* row(float* room, int k) const noexcept {
+        return room + static_cast<std::size_t>(k) * pitch_;
     }
 
-    /** One transform within a row of `samples_`: the packed spectrum leaves out the imaginary parts that are 0. */
-    void transform(float* packed) noexcept {
-        float* const half = spectrum_.get();
+    void gather(const float* in, int width, float* room) const noexcept {
+        if (geometry_.stride == 1 && width == 1) return void(std::copy_n(in, length_, room));
+        for (std::size_t i = 0; i < length_; ++i)
+            for (int k = 0; k < width; ++k)
+                row(room, k)[i] = in[static_cast<std::ptrdiff_t>(i) * geometry_.stride + k * geometry_.distance];
+    }
+    void scatter(float* room, int width, float* out) const noexcept {
+        if (geometry_.stride == 1 && width == 1) return void(std::copy_n(room, length_, out));
+        for (std::size_t i = 0; i < length_; ++i)
+            for (int k = 0; k < width; ++k)
+                out[static_cast<std::ptrdiff_t>(i) * geometry_.stride + k * geometry_.distance] = row(room, k)[i];
+    }
+
+    /** One transform within a row: the packed spectrum leaves out the imaginary parts that are 0. */
+    void transform(float* packed, float* half) const noexcept {
         if (geometry_.forward) {
             fftwf_execute_dft_r2c(plan_.get(), packed, reinterpret_cast<fftwf_complex*>(half));
             packed[0] = half[0];
@@ -228,7 +238,7 @@ private:
     FftGeometry geometry_;
     std::size_t length_, pitch_;
     int group_;
-    Floats samples_, spectrum_;
+    SpareFloats room_;
     Plan plan_;
 };
 

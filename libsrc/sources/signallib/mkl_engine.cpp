@@ -3,6 +3,7 @@
 
 #include <array>
 #include <map>
+#include <mutex>
 #include <new>
 #include <type_traits>
 #include <utility>
@@ -149,6 +150,8 @@ private:
 FftEngine* open_mkl(const char* file) {
     // One for each library, never unloaded: plans may outlive every other object.
     static auto& engines = *new std::map<void*, MklEngine>;
+    static std::mutex opening;
+    const std::lock_guard guard{opening};
     void* library = dlopen(file, RTLD_NOW | RTLD_LOCAL);
     if (!library) return nullptr;
     const auto [entry, fresh] = engines.try_emplace(library);

@@ -7,6 +7,7 @@ namespace quo {
 FftEnginePlan* PlanStore::open(FftEngine& engine, const FftGeometry& geometry) {
     std::shared_ptr<FftTransform> transform = transform_for(engine, geometry);
     if (!transform) return nullptr;
+    const std::lock_guard guard{guard_};
     const std::uintptr_t key = next_;
     held_.emplace(key, std::move(transform));
     next_ += 2;
@@ -14,20 +15,45 @@ FftEnginePlan* PlanStore::open(FftEngine& engine, const FftGeometry& geometry) {
 }
 
 FftTransform* PlanStore::find(const FftEnginePlan* handle) const noexcept {
+    const std::lock_guard guard{guard_};
     const auto found = held_.find(key_of(handle));
     return found == held_.end() ? nullptr : found->second.get();
 }
 
-std::shared_ptr<FftTransform> PlanStore::transform_for(FftEngine& engine, const FftGeometry& geometry) {
+bool PlanStore::close(const FftEnginePlan* handle) noexcept {
+    const std::lock_guard guard{guard_};
+    return held_.erase(key_of(handle)) != 0;
+}
+
+std::size_t PlanStore::held() const noexcept {
+    const std::lock_guard guard{guard_};
+    return held_.size();
+}
+
+std::size_t PlanStore::kept() const noexcept {
+    const std::lock_guard guard{guard_};
+    return kept_.size();
+}
+
+std::shared_ptr<FftTransform> PlanStore::find_kept(const FftEngine& engine, const FftGeometry& geometry) {
     const auto found = std::find_if(kept_.begin(), kept_.end(), [&](const Kept& kept) {
         return kept.engine == &engine && kept.transform->geometry() == geometry;
     });
-    if (found != kept_.end()) {
-        std::rotate(kept_.begin(), found, found + 1);
-        return kept_.front().transform;
+    if (found == kept_.end()) return nullptr;
+    std::rotate(kept_.begin(), found, found + 1);
+    return kept_.front().transform;
+}
+
+std::shared_ptr<FftTransform> PlanStore::transform_for(FftEngine& engine, const FftGeometry& geometry) {
+    {
+        const std::lock_guard guard{guard_};
+        if (auto known = find_kept(engine, geometry)) return known;
     }
     std::shared_ptr<FftTransform> transform = make_fft_transform(engine, geometry);
-    if (transform) keep(engine, transform);
+    if (!transform) return nullptr;
+    const std::lock_guard guard{guard_};
+    if (auto known = find_kept(engine, geometry)) return known;  // another thread was faster
+    keep(engine, transform);
     return transform;
 }
 

@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <memory>
+#include <mutex>
 #include <unordered_map>
 #include <vector>
 
@@ -12,9 +13,9 @@
 
 namespace quo {
 
-/** The plans of the process: those that callers hold, by handles, and those that were measured last, to be had
- * again for nothing. A handle is a number that is never given twice, not an address, so that a stale or made-up
- * one is found out. */
+/** The plans of the process, for all threads: those that callers hold, by handles, and those that were measured
+ * last, to be had again for nothing. A handle is a number that is never given twice, not an address, so that a
+ * stale or made-up one is found out. */
 class PlanStore {
 public:
     /** Bounds of what is kept beyond the callers' plans. */
@@ -25,10 +26,10 @@ public:
     /** Null for a handle that is not held. */
     [[nodiscard]] FftTransform* find(const FftEnginePlan* handle) const noexcept;
     /** False for a handle that is not held. */
-    bool close(const FftEnginePlan* handle) noexcept { return held_.erase(key_of(handle)) != 0; }
+    bool close(const FftEnginePlan* handle) noexcept;
 
-    [[nodiscard]] std::size_t held() const noexcept { return held_.size(); }
-    [[nodiscard]] std::size_t kept() const noexcept { return kept_.size(); }
+    [[nodiscard]] std::size_t held() const noexcept;
+    [[nodiscard]] std::size_t kept() const noexcept;
 
 private:
     struct Kept {
@@ -38,8 +39,10 @@ private:
 
     static std::uintptr_t key_of(const FftEnginePlan* handle) { return reinterpret_cast<std::uintptr_t>(handle); }
     std::shared_ptr<FftTransform> transform_for(FftEngine& engine, const FftGeometry& geometry);
+    std::shared_ptr<FftTransform> find_kept(const FftEngine& engine, const FftGeometry& geometry);
     void keep(FftEngine& engine, const std::shared_ptr<FftTransform>& transform);
 
+    mutable std::mutex guard_;  ///< never held while a transform is measured or runs
     std::unordered_map<std::uintptr_t, std::shared_ptr<FftTransform>> held_;
     std::vector<Kept> kept_;  ///< the one used last stands first
     std::size_t kept_bytes_ = 0;

@@ -55,8 +55,8 @@ template <typename Bits>
 }
 
 // The byte shuffles that make these loops fast came after the processors' common base: each loop is compiled for
-// several of them, and the form to use is chosen when the library is loaded.
-#if defined(__x86_64__) && defined(__gnu_linux__)
+// several of them, and the form to use is chosen when the library is loaded: too early for the thread sanitizer.
+#if defined(__x86_64__) && defined(__gnu_linux__) && !defined(__SANITIZE_THREAD__)
 #define QUO_FORM_PER_PROCESSOR __attribute__((target_clones("avx2", "ssse3", "default")))
 #else
 #define QUO_FORM_PER_PROCESSOR
