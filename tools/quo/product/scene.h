@@ -29,6 +29,7 @@ public:
 
     const std::string& name() const { return name_; }
     GeneralSAROrbit& orbit() { return orbit_; }
+    const GeneralSAROrbit& orbit() const { return orbit_; }
 
     /** Sets the wavelength in m; throws WrongUse where it is not above 0. */
     void use_wavelength(double wavelength_m);

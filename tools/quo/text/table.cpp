@@ -51,8 +51,9 @@ Table::Table(const std::string& name) : input_{name} {
         comments_.emplace_back(trimmed(std::string_view{line_}.substr(1)));
     }
     if (line_.empty() || line_.front() == '#') throw Failure(input_.name() + ": no line of column names");
-    if (!split_fields(line_, fields_)) throw Failure(place() + ": a quote is not closed");
-    for (const std::string_view field : fields_) columns_.emplace_back(unquoted(field));
+    row_.take(line_, input_.line_number());
+    if (!row_.well_quoted()) throw Failure(place() + ": a quote is not closed");
+    for (const std::string_view field : row_.fields()) columns_.emplace_back(unquoted(field));
 }
 
 std::optional<std::size_t> Table::find(std::string_view column) const {
@@ -68,35 +69,53 @@ std::size_t Table::need(std::string_view column) const {
     throw Failure(input_.name() + ": no column " + std::string{column});
 }
 
-bool Table::next() {
-    while (input_.next(line_)) {
-        if (line_.empty() || line_.front() == '#') continue;
-        well_quoted_ = split_fields(line_, fields_);
-        return true;
-    }
+bool Table::next_line() {
+    while (input_.next(line_))
+        if (!line_.empty() && line_.front() != '#') return true;
     return false;
 }
 
-std::optional<std::string> Table::defect() const {
+bool Table::next() {
+    if (!next_line()) return false;
+    row_.take(line_, input_.line_number());
+    return true;
+}
+
+std::optional<Rows> Table::next_rows(std::size_t most) {
+    Rows rows;
+    while (rows.lines.size() < most && next_line()) {
+        rows.text += line_;
+        rows.lines.push_back({rows.text.size(), input_.line_number()});
+    }
+    rows.bytes_read = input_.bytes_read();
+    if (rows.lines.empty()) return std::nullopt;
+    return rows;
+}
+
+std::optional<std::string> Row::defect(std::size_t columns) const {
     if (!well_quoted_) return "a quote is not closed";
-    if (fields_.size() != columns_.size())
-        return std::to_string(fields_.size()) + " values for " + std::to_string(columns_.size()) + " columns";
+    if (fields_.size() != columns)
+        return std::to_string(fields_.size()) + " values for " + std::to_string(columns) + " columns";
     return std::nullopt;
 }
 
 std::vector<double> Table::numbers(std::span<const std::size_t> columns) const {
-    if (const auto wrong = defect()) throw Failure(place() + ": " + *wrong);
+    if (const auto wrong = row_.defect(columns_.size())) throw Failure(place() + ": " + *wrong);
     std::vector<double> values;
     for (const std::size_t column : columns) {
-        const auto number = finite_number(fields_[column]);
+        const auto number = finite_number(row_.fields()[column]);
         if (!number)
-            throw Failure(place() + ": " + columns_[column] + " is \"" + std::string{fields_[column]} +
+            throw Failure(place() + ": " + columns_[column] + " is \"" + std::string{row_.fields()[column]} +
                           "\", not a number");
         values.push_back(*number);
     }
     return values;
 }
 
-std::string Table::place() const { return input_.name() + ": line " + std::to_string(input_.line_number()); }
+std::string Table::place() const { return place(input_.line_number()); }
+
+std::string Table::place(std::int64_t line_number) const {
+    return input_.name() + ": line " + std::to_string(line_number);
+}
 
 }  // namespace tool

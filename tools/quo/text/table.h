@@ -19,6 +19,53 @@ namespace tool {
  * last field */
 bool split_fields(std::string_view line, std::vector<std::string_view>& fields);
 
+/** A row of a table, taken apart. */
+class Row {
+public:
+    /** Takes a line apart, which stands as long as the row is asked. */
+    void take(std::string_view line, std::int64_t number) {
+        line_ = line;
+        number_ = number;
+        well_quoted_ = split_fields(line_, fields_);
+    }
+    /** The row's line as it stands, its number in the file, and its fields. */
+    std::string_view line() const { return line_; }
+    std::int64_t number() const { return number_; }
+    const std::vector<std::string_view>& fields() const { return fields_; }
+    bool well_quoted() const { return well_quoted_; }
+    /** What is wrong with the shape of a row that should have so many columns, or nothing. */
+    std::optional<std::string> defect(std::size_t columns) const;
+
+private:
+    std::string_view line_;
+    std::int64_t number_ = 0;
+    std::vector<std::string_view> fields_;
+    bool well_quoted_ = true;
+};
+
+/** Some rows of a table as they stand, to be taken apart by whoever works on them. */
+struct Rows {
+    struct Line {
+        std::size_t end;      ///< of its text
+        std::int64_t number;  ///< in the file
+    };
+    std::string text;
+    std::vector<Line> lines;
+    std::int64_t bytes_read = 0;  ///< of the input, up to the last of them
+
+    /** Calls visit(row) for each. */
+    template <typename Visit>
+    void each(Visit visit) const {
+        Row row;
+        std::size_t begin = 0;
+        for (const Line& line : lines) {
+            row.take(std::string_view{text}.substr(begin, line.end - begin), line.number);
+            visit(row);
+            begin = line.end;
+        }
+    }
+};
+
 /** A table in text: comment lines (they begin with '#'), a line of column names, then one row per line, all of
  * comma-separated values. Values that hold a comma stand in double quotes; a row never spans lines. Empty lines
  * and comment lines are skipped wherever they stand; a byte order mark at the start is too. */
@@ -37,25 +84,24 @@ public:
 
     /** Goes to the next row; false at the end. */
     bool next();
-    /** The row's line as it stands, and its fields. */
-    std::string_view line() const { return line_; }
-    const std::vector<std::string_view>& fields() const { return fields_; }
-    bool well_quoted() const { return well_quoted_; }
-    /** What is wrong with the row's shape, or nothing. */
-    std::optional<std::string> defect() const;
+    const Row& row() const { return row_; }
+    /** The next rows, so many at most; nothing at the end. row() stays behind. */
+    std::optional<Rows> next_rows(std::size_t most);
     /** The row's numbers in some columns; throws Failure for a row with a defect, or that lacks one of them. */
     std::vector<double> numbers(std::span<const std::size_t> columns) const;
-    /** "file: line 17", for messages about the row. */
+    /** "file: line 17", for messages about a row: the present one, unless told. */
     std::string place() const;
+    std::string place(std::int64_t line_number) const;
 
     const LineReader& input() const { return input_; }
 
 private:
+    bool next_line();
+
     LineReader input_;
     std::vector<std::string> columns_, comments_;
     std::string line_;
-    std::vector<std::string_view> fields_;
-    bool well_quoted_ = true;
+    Row row_;
 };
 
 }  // namespace tool

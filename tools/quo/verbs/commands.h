@@ -9,6 +9,7 @@
 #include <vector>
 
 // What every verb says, and how.
+#include "common/blocks.h"
 #include "failure.h"
 #include "number.h"
 #include "shown.h"
@@ -42,6 +43,13 @@ Verb<Options> add_verb(CLI::App& app, Job& job, const char* name, const char* ab
     CLI::App* command = app.add_subcommand(name, about);
     command->callback([options, run, &job] { job = [options, run] { return run(*options); }; });
     return {command, *options};
+}
+
+/** Declares the option --threads of a verb that works in blocks: all processors, unless told. */
+inline void add_threads_option(CLI::App& command, int& threads) {
+    threads = blocks::all_processors();
+    command.add_option("--threads", threads, "Threads to work with; all processors unless told")
+        ->check(CLI::Range(1, 1024));
 }
 
 }  // namespace tool

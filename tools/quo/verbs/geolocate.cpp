@@ -2,6 +2,7 @@
 #include <array>
 #include <cmath>
 #include <limits>
+#include <memory>
 #include <optional>
 #include <span>
 
@@ -20,6 +21,7 @@ struct GeolocateOptions {
     std::string header, direction, input = "-", output = "-", look;
     std::optional<double> wavelength_m, resample_s, height_m;
     bool precise = false, waitbar = false;
+    int threads = 0;
 };
 
 constexpr std::size_t kInputs = 3;  // at most
@@ -32,48 +34,88 @@ struct Input {
     double highest = std::numeric_limits<double>::max();
 };
 
-/** What a row may say beside its place; 0, or what the command line says, where the table has no such column. */
-struct Aside {
-    double doppler_hz = 0.0;
-    double height_m = 0.0;  // of the ground points that --to ground finds
+/** Points that are solved together: what was read of them, and what is found. */
+struct Points {
+    std::array<std::vector<double>, kInputs> in;
+    std::vector<double> doppler_hz, height_m;  // 0, or what the command line says, where the table has no column
+    std::array<std::vector<double>, kOutputs> out;
+    std::vector<std::int32_t> status;
+
+    [[nodiscard]] std::size_t count() const { return status.size(); }
+    void resize(std::size_t count) {
+        for (auto& values : in) values.resize(count);
+        for (auto& values : out) values.resize(count);
+        doppler_hz.resize(count);
+        height_m.resize(count);
+        status.resize(count);
+    }
 };
 
 /** One way through the geometry: what it must read, what it adds, and how. */
 struct Direction {
     std::span<const Input> inputs;
     std::span<const char* const> outputs;
-    int (*solve)(Scene& scene, const double* in, const Aside& aside, double* out);
+    /** `own` is as freshly loaded, whatever block was before. */
+    void (*solve)(const Scene& scene, GeneralSAROrbit& own, Points& points);
 };
 
 constexpr Input kDoppler{"doppler_hz"}, kHeight{"height_m"};
 
-int to_ground(Scene& scene, const double* in, const Aside& aside, double* out) {
-    const double time_s = in[0];
-    const double range_s = in[1];
-    if (!scene.covers(time_s)) return QUO_NOT_SEEN;
-    GrPtGeometry at{};
-    const int status = scene.orbit().SVGetGeometry(time_s, range_s, aside.doppler_hz, aside.height_m, &at);
-    const auto& [x, y, z] = at.point_m;
-    const double values[] = {
-        x, y, z, at.latitude_deg, at.longitude_deg, at.incidence_deg, at.look_deg, at.fm_rate_hz_s, at.speed_m_s};
-    std::ranges::copy(values, out);
-    return status;
+void require_solved(int status) {
+    if (status != QUO_OK) throw Failure("status " + status_text(status));
 }
 
-using Inverse = int (GeneralSAROrbit::*)(const double*, double*, double*, double) noexcept;
+void to_ground(const Scene& scene, GeneralSAROrbit& /*own*/, Points& points) {
+    auto& [x, y, z, latitude, longitude, incidence, look, fm_rate, speed] = points.out;
+    const auto& [time_s, range_s, unused] = points.in;
+    const OrbitSamples samples{points.count(), time_s.data(), range_s.data(), points.doppler_hz.data(),
+                               points.height_m.data()};
+    OrbitGround ground{.latitude_deg = latitude.data(), .longitude_deg = longitude.data()};
+    ground.x_m = x.data();
+    ground.y_m = y.data();
+    ground.z_m = z.data();
+    ground.incidence_deg = incidence.data();
+    ground.look_deg = look.data();
+    ground.fm_rate_hz_s = fm_rate.data();
+    ground.speed_m_s = speed.data();
+    ground.status = points.status.data();
+    require_solved(scene.orbit().sat2earth(samples, ground));
+    for (std::size_t i = 0; i < points.count(); ++i)
+        if (!scene.covers(time_s[i])) points.status[i] = QUO_NOT_SEEN;
+}
 
 // The equations of range and Doppler know nothing of the Earth in between: a point near the antipode solves them
 // too.
-template <Inverse solve>
-int to_radar(Scene& scene, const double* in, const Aside& aside, double* out) {
-    const GeodeticPoint ground{in[0], in[1], in[2]};
-    double point[3], platform[3];
-    quo::store(quo::from_geodetic(ground), point);
-    int status = (scene.orbit().*solve)(point, out, out + 1, aside.doppler_hz);
-    if (status == 0) status = scene.orbit().SVGetPos(out[0], platform);
-    if (status != 0) return status;
-    const quo::Vec3 line = quo::load(platform) - quo::load(point);
-    return angle_deg(line, quo::ellipsoid_normal(ground)) > 90.0 ? QUO_NOT_SEEN : QUO_OK;
+void refuse_hidden(GeneralSAROrbit& orbit, Points& points) {
+    for (std::size_t i = 0; i < points.count(); ++i) {
+        if (points.status[i] != QUO_OK) continue;
+        const GeodeticPoint ground{points.in[0][i], points.in[1][i], points.in[2][i]};
+        double platform[3];
+        const int status = orbit.SVGetPos(points.out[0][i], platform);
+        const quo::Vec3 line = quo::load(platform) - quo::from_geodetic(ground);
+        const bool hidden = dot(line, quo::ellipsoid_normal(ground)) < 0.0;
+        points.status[i] = status != QUO_OK ? status : hidden ? QUO_NOT_SEEN : QUO_OK;
+    }
+}
+
+void to_radar(const Scene& scene, GeneralSAROrbit& own, Points& points) {
+    OrbitTargets targets{.count = points.count()};
+    targets.latitude_deg = points.in[0].data();
+    targets.longitude_deg = points.in[1].data();
+    targets.height_m = points.in[2].data();
+    targets.doppler_hz = points.doppler_hz.data();
+    require_solved(
+        scene.orbit().earth2sat(targets, {points.out[0].data(), points.out[1].data(), points.status.data()}));
+    refuse_hidden(own, points);
+}
+
+void to_radar_precisely(const Scene& /*scene*/, GeneralSAROrbit& own, Points& points) {
+    for (std::size_t i = 0; i < points.count(); ++i) {
+        double point[3];
+        quo::store(quo::from_geodetic({points.in[0][i], points.in[1][i], points.in[2][i]}), point);
+        points.status[i] = own.earth2satPrecise(point, &points.out[0][i], &points.out[1][i], points.doppler_hz[i]);
+    }
+    refuse_hidden(own, points);
 }
 
 constexpr Input kSample[] = {{"azimuth_time_s"}, {"range_time_s"}};
@@ -83,8 +125,8 @@ constexpr const char* kGeometry[] = {"x_m",           "y_m",      "z_m",        
 constexpr const char* kTimes[] = {"azimuth_time_s", "range_time_s"};
 
 constexpr Direction kToGround{kSample, kGeometry, to_ground};
-constexpr Direction kToRadar{kPoint, kTimes, to_radar<&GeneralSAROrbit::earth2sat>};
-constexpr Direction kToRadarPrecisely{kPoint, kTimes, to_radar<&GeneralSAROrbit::earth2satPrecise>};
+constexpr Direction kToRadar{kPoint, kTimes, to_radar};
+constexpr Direction kToRadarPrecisely{kPoint, kTimes, to_radar_precisely};
 
 const Direction& direction_of(const GeolocateOptions& options) {
     if (options.direction == "ground") {
@@ -101,43 +143,47 @@ const Direction& direction_of(const GeolocateOptions& options) {
 class Columns {
 public:
     Columns(const Table& table, const GeolocateOptions& options, const Direction& direction)
-        : doppler_{table.find(kDoppler.name)} {
+        : in_all_{table.columns().size()}, inputs_{direction.inputs}, doppler_{table.find(kDoppler.name)} {
         for (const Input& input : direction.inputs) indices_.push_back(table.need(input.name));
         if (&direction == &kToGround) height_ = table.find(kHeight.name);
         if (height_ && options.height_m)
             throw Failure(table.input().name() + ": there is a column " + kHeight.name + ", and --height");
-        unless_told_.height_m = options.height_m.value_or(0.0);
+        given_height_m_ = options.height_m.value_or(0.0);
     }
     bool has_doppler() const { return doppler_.has_value(); }
+    std::size_t count() const { return in_all_; }
 
-    /** The row's values, or what is wrong with them. */
-    std::optional<std::string> read(const Table& table, const Direction& direction, double* in,
-                                    Aside& aside) const {
-        if (auto defect = table.defect()) return defect;
-        for (std::size_t i = 0; i < indices_.size(); ++i)
-            if (auto defect = read_one(table, direction.inputs[i], indices_[i], in[i])) return defect;
-        aside = unless_told_;
+    /** Reads a row's values to place `i`, or tells what is wrong with them. */
+    std::optional<std::string> read(const Row& row, Points& points, std::size_t i) const {
+        if (auto defect = row.defect(in_all_)) return defect;
+        for (std::size_t k = 0; k < indices_.size(); ++k)
+            if (auto defect = read_one(row, inputs_[k], indices_[k], points.in[k][i])) return defect;
+        points.doppler_hz[i] = 0.0;
+        points.height_m[i] = given_height_m_;
         if (doppler_)
-            if (auto defect = read_one(table, kDoppler, *doppler_, aside.doppler_hz)) return defect;
-        return height_ ? read_one(table, kHeight, *height_, aside.height_m) : std::nullopt;
+            if (auto defect = read_one(row, kDoppler, *doppler_, points.doppler_hz[i])) return defect;
+        return height_ ? read_one(row, kHeight, *height_, points.height_m[i]) : std::nullopt;
     }
 
 private:
-    static std::optional<std::string> read_one(const Table& table, const Input& input, std::size_t index,
+    static std::optional<std::string> read_one(const Row& row, const Input& input, std::size_t index,
                                                double& value) {
-        const std::string_view text = table.fields()[index];
+        const std::string_view text = row.fields()[index];
         const auto number = finite_number(text);
+        if (number && *number >= input.lowest && *number <= input.highest) {
+            value = *number;
+            return std::nullopt;
+        }
         const std::string what = std::string{input.name} + " is \"" + std::string{text} + "\"";
         if (!number) return what + ", not a number";
-        if (*number < input.lowest || *number > input.highest)
-            return what + ", outside " + fixed(input.lowest, 0) + " to " + fixed(input.highest, 0);
-        value = *number;
-        return std::nullopt;
+        return what + ", outside " + fixed(input.lowest, 0) + " to " + fixed(input.highest, 0);
     }
 
+    std::size_t in_all_;
+    std::span<const Input> inputs_;
     std::vector<std::size_t> indices_;
     std::optional<std::size_t> doppler_, height_;
-    Aside unless_told_;
+    double given_height_m_ = 0.0;
 };
 
 /** A name for a computed column that no column of the table bears yet. */
@@ -148,43 +194,97 @@ std::string free_name(const Table& table, std::string name) {
 }
 
 std::string heading(const Table& table, const Direction& direction) {
-    std::string line{table.line()};
+    std::string line{table.row().line()};
     for (const char* output : direction.outputs) line += "," + free_name(table, output);
     return line + "," + free_name(table, "status") + "\n";
 }
 
 /** The row's own fields, as many as there are columns, so that the computed ones stand where they belong. */
-void append_row(std::string& line, const Table& table) {
-    if (!table.defect()) {
-        line += table.line();
+void append_row(std::string& text, const Row& row, std::size_t columns) {
+    if (!row.defect(columns)) {
+        text += row.line();
         return;
     }
-    for (std::size_t i = 0; i < table.columns().size(); ++i) {
-        if (i > 0) line += ',';
-        if (table.well_quoted() && i < table.fields().size()) line += table.fields()[i];
+    for (std::size_t i = 0; i < columns; ++i) {
+        if (i > 0) text += ',';
+        if (row.well_quoted() && i < row.fields().size()) text += row.fields()[i];
     }
 }
 
-/** Solves one row and writes it. Returns nothing, or why there is no solution. */
-std::optional<std::string> geolocate_row(Scene& scene, const Table& table, const Direction& direction,
-                                         const Columns& columns, std::string& line) {
-    std::array<double, kInputs> in{};
-    std::array<double, kOutputs> out{};
-    Aside aside;
-    auto cause = columns.read(table, direction, in.data(), aside);
-    const int status = cause ? QUO_REFUSED : direction.solve(scene, in.data(), aside, out.data());
-    if (!cause && status != 0) cause = "status " + status_text(status);
+/** What became of some rows: their text, and why there is no solution for some of them. */
+struct Solved {
+    struct Complaint {
+        std::int64_t line_number;
+        std::string cause;
+    };
+    std::string text;
+    std::vector<Complaint> complaints;
+    std::int64_t rows = 0, bytes_read = 0;
+};
 
-    append_row(line, table);
-    for (std::size_t i = 0; i < direction.outputs.size(); ++i) {
-        line += ',';
-        if (status == 0) append_exact(line, out[i]);
+/** Solves rows and writes them, with room of its own for their values. */
+class RowSolver {
+public:
+    RowSolver(Scene& scene, const Columns& columns, const Direction& direction)
+        : scene_{&scene}, columns_{&columns}, direction_{&direction} {
+        require_solved(scene.orbit().clone(loaded_.get()));
     }
-    line += "," + std::to_string(status) + "\n";
-    return cause;
-}
+
+    Solved operator()(const Rows& rows) {
+        Solved solved;
+        read(rows);
+        require_solved(loaded_->clone(own_.get()));
+        direction_->solve(*scene_, *own_, points_);
+        write(rows, solved);
+        solved.rows = static_cast<std::int64_t>(rows.lines.size());
+        solved.bytes_read = rows.bytes_read;
+        return solved;
+    }
+
+private:
+    void read(const Rows& rows) {
+        points_.resize(rows.lines.size());
+        defects_.clear();
+        std::size_t i = 0;
+        rows.each([&](const Row& row) {
+            defects_.push_back(columns_->read(row, points_, i));
+            if (defects_.back()) clear(i);
+            ++i;
+        });
+    }
+    /** A point that is none: it is solved along, and nobody asks. */
+    void clear(std::size_t i) {
+        for (auto& values : points_.in) values[i] = 0.0;
+        points_.doppler_hz[i] = points_.height_m[i] = 0.0;
+    }
+    void write(const Rows& rows, Solved& solved) {
+        std::size_t i = 0;
+        rows.each([&](const Row& row) {
+            auto& cause = defects_[i];
+            const int status = cause ? QUO_REFUSED : points_.status[i];
+            if (!cause && status != 0) cause = "status " + status_text(status);
+            append_row(solved.text, row, columns_->count());
+            for (std::size_t k = 0; k < direction_->outputs.size(); ++k) {
+                solved.text += ',';
+                if (status == 0) append_exact(solved.text, points_.out[k][i]);
+            }
+            solved.text += "," + std::to_string(status) + "\n";
+            if (cause) solved.complaints.push_back({row.number(), std::move(*cause)});
+            ++i;
+        });
+    }
+
+    const Scene* scene_;
+    const Columns* columns_;
+    const Direction* direction_;
+    std::unique_ptr<GeneralSAROrbit> loaded_ = std::make_unique<GeneralSAROrbit>(),
+                                     own_ = std::make_unique<GeneralSAROrbit>();
+    Points points_;
+    std::vector<std::optional<std::string>> defects_;  // of each row
+};
 
 int geolocate_table(Scene& scene, const GeolocateOptions& options, const Direction& direction) {
+    constexpr std::size_t kRowsAtOnce = 4096;
     Table table{options.input};
     const Columns columns{table, options, direction};
     if (&direction == &kToGround) scene.require_look_side();
@@ -196,17 +296,21 @@ int geolocate_table(Scene& scene, const GeolocateOptions& options, const Directi
     std::int64_t rows = 0, unsolved = 0;
     {
         Progress progress{options.waitbar ? "Geolocating" : nullptr};
-        std::string line;
-        while (table.next()) {
-            line.clear();
-            const auto cause = geolocate_row(scene, table, direction, columns, line);
-            if (cause && ++unsolved <= kShown) {
+        const auto hand_on = [&](const Solved& solved) {
+            for (const auto& [line_number, cause] : solved.complaints) {
+                if (++unsolved > kShown) continue;
                 progress.wipe();
-                complain(table.place() + ": " + *cause);
+                complain(table.place(line_number) + ": " + cause);
             }
-            output.write(line);
-            progress.show(table.input().bytes_read(), table.input().bytes_in_all(), ++rows);
-        }
+            output.write(solved.text);
+            progress.show(solved.bytes_read, table.input().bytes_in_all(), rows += solved.rows);
+        };
+        blocks::in_order(
+            options.threads, [&] { return table.next_rows(kRowsAtOnce); },
+            [&] {
+                return RowSolver{scene, columns, direction};
+            },
+            hand_on);
     }
     output.commit();
     if (unsolved == 0) return kFine;
@@ -266,6 +370,7 @@ void add_geolocate(CLI::App& app, Job& job) {
     command->add_option("--height", options.height_m, "Height of all ground points in m, instead of a column's");
     command->add_option("--resample", options.resample_s, "State vectors at most so many seconds apart");
     add_waitbar_option(*command, options.waitbar);
+    add_threads_option(*command, options.threads);
 }
 
 }  // namespace tool
