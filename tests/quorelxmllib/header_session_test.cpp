@@ -18,8 +18,8 @@ using test::write_text;
 class HeaderSessionTest : public testing::Test {
 protected:
     HeaderSessionTest() { object_.fill(3); }
-    int write(const std::string& file, const char* section, int channel = 1) {
-        return object_.writeAuxiliaryFile(file.c_str(), channel, section);
+    int write(const std::string& file, const char* section) {
+        return object_.writeAuxiliaryFile(file.c_str(), 1, section);
     }
     bool read(const std::string& file, const char* section) {
         return Shelf{}.readAuxiliaryFile(file.c_str(), 1, section);
@@ -29,27 +29,7 @@ protected:
     Shelf object_;
 };
 
-// The same bytes must reach the disk in one save and object by object.
-TEST_F(HeaderSessionTest, WritesTheBytesOfObjectByObject) {
-    const auto write_product = [&](const std::string& file) {
-        for (const int books : {3, 7}) {
-            object_.fill(books);
-            for (const char* section : {"Library", "Library/Room-0", "Library/Room-1", "Shelf"})
-                EXPECT_EQ(write(file, section) + write(file, "Shelf", 2), 0);
-        }
-    };
-    for (const std::string& text : {std::string{}, std::string{"<Other/>"}, Shelf::text()}) {
-        write_text(other_, text);
-        write_text(file_, text);
-        write_product(other_);
-        HeaderSession session{file_.c_str()};
-        write_product(file_);
-        EXPECT_EQ(read_text(file_), text) << "nothing is saved before the end";
-        EXPECT_EQ(session.commit(), 0);
-        EXPECT_EQ(read_text(file_), read_text(other_));
-    }
-}
-
+// That the same bytes reach the disk in one save and object by object is tested with the products.
 TEST_F(HeaderSessionTest, ParsesOnce) {
     write_text(file_, Shelf::text());
     const HeaderSession session{file_.c_str()};

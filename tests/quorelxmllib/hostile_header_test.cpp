@@ -74,15 +74,6 @@ TEST_F(HostileHeaderFile, ReadsAsAFreshDocument) {
     }
 }
 
-TEST_F(HostileHeaderFile, IsAcceptedWithADoctypeThatDeclaresNothing) {
-    for (const char* type : {"<!DOCTYPE QuorelXmlDoc>", "<!DOCTYPE QuorelXmlDoc [ <!-- none --> ]>",
-                             "<!DOCTYPE QuorelXmlDoc SYSTEM \"http://localhost:1/none.dtd\">"}) {
-        Shelf object;
-        write_text(file_, replaced(good_, "<QuorelXmlDoc>", type + std::string{"<QuorelXmlDoc>"}));
-        EXPECT_TRUE(read(object)) << type;
-    }
-}
-
 /** The texts of a field as they pass while the file is read, or none with 1. Those of the document are the same.
  */
 std::vector<std::string> expect_same_texts(const std::string& file, const char* field) {

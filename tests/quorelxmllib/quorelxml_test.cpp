@@ -84,15 +84,6 @@ TEST_F(Quorelxml, WritesItsLayout) {
     EXPECT_EQ(read_text(new_file_), golden("layout.xml"));
 }
 
-TEST_F(Quorelxml, KeepsWhatItDoesNotKnowInUtf8) {
-    const std::string text = golden("foreign.xml");
-    quorelxml document{file(text).c_str()};
-    const double value = 2.5;
-    EXPECT_EQ(document.writeDouble(1, "Sec/known", &value, 1) + document.write(), 0);
-    EXPECT_EQ(read_text(file_),
-              replaced(replaced(replaced(text, "ISO-8859-1", "UTF-8"), "\xE0", "\xC3\xA0"), "1.5", "2.5"));
-}
-
 TEST_F(Quorelxml, SetsTheDescriptionOnDisk) {
     OpenDocument document;
     const std::string text = header_text("    <a>1</a>\n"), endless(3000, 'd');

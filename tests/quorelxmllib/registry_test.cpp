@@ -8,19 +8,16 @@
 
 #include "header_files.h"
 #include "quo_base/quorelxml_v2.h"
-#include "shelf.h"
 
 namespace {
 
 using test::header_text;
 using test::read_text;
-using test::Shelf;
 using test::write_text;
 
 /** A header class whose registration and allocation the test decides. */
 class Free : public GeneralSAR_Base {
 public:
-    using GeneralSAR_Base::addElementDouble;
     using GeneralSAR_Base::addElementInt;
     using GeneralSAR_Base::addElementString;
     using GeneralSAR_Base::createElementsVector;
@@ -102,28 +99,6 @@ TEST_F(Registry, MakesOneTableForAClassOfClasses) {
     delete[] kept;
 }
 
-TEST_F(Registry, WritesItsSectionOnceAndKeepsTheOthers) {
-    double values[] = {1.5, 2.5};
-    char one[512] = "a < b", two[512] = "";
-    char* texts[] = {one, two};
-    make(3, [&](Free& self) {
-        self.addElementDouble("values", values, i_, 0, 0, true);
-        self.addElementInt("n", &i_, 1, 0, 0, true);
-        self.addElementString("texts", texts, 2, true);
-    });
-    const std::string others = "    <T>\n      <kept/>\n    </T>\n",
-                      end = "      <texts N=\"1\">a &lt; b</texts>\n      <texts N=\"2\"/>\n    </S>\n";
-    write_text(file_, header_text("    <S old=\"1\">\n      <gone/>\n    </S>\n" + others));
-    for (i_ = 2; i_ >= 0; i_ -= 2) {  // a length of 0 writes no array
-        object_.registration(object_);
-        for (int twice = 0; twice < 2; ++twice) EXPECT_EQ(object_.writeAuxiliaryFile(file_.c_str(), 1, "S"), 0);
-        const std::string array =
-            "      <values>\n        <val N=\"1\">1.5</val>\n        <val N=\"2\">2.5</val>\n      </values>\n";
-        EXPECT_EQ(read_text(file_), header_text(others + "    <S>\n" + (i_ ? array : "") + "      <n>" +
-                                                std::to_string(i_) + "</n>\n" + end));
-    }
-}
-
 // Which elements may be missing is tested with the classes that have them, lengths that follow their arrays with
 // the shelf.
 TEST_F(Registry, WorksOnTheAttachedFileStepByStep) {
@@ -150,25 +125,17 @@ TEST_F(Registry, WorksOnTheAttachedFileStepByStep) {
     EXPECT_EQ(object_.unsetAuxiliaryFile(), 0);
     EXPECT_EQ(object_.readAuxiliaryFile() + object_.writeAuxiliaryFile(), 2);
 
+    const std::string long_name(600, 's');
+    for (const char* section : {static_cast<const char*>(nullptr), "", "a b", "..", "S/", long_name.c_str()})
+        EXPECT_EQ(object_.writeAuxiliaryFile(file, 1, section), 1);
+    EXPECT_EQ(object_.writeAuxiliaryFile(folder_.file(long_name).c_str(), 1, "S"), 1);
+
     // Without buffers nothing is written, but the section is gone from the document in memory all the same.
     object_.setAllocationFlag(false);
     EXPECT_EQ(object_.setAuxiliaryFile(file, 1, "S"), 0);
     EXPECT_EQ(object_.writeAuxiliaryFile() + object_.readAuxiliaryFile(), 2);
     EXPECT_EQ(i_, 42);
     EXPECT_EQ(read_text(file_), written);
-}
-
-TEST_F(Registry, RefusesBadFilesAndSections) {
-    Shelf object;
-    object.fill(2);
-    const std::string before = header_text("<S><i>1</i></S>"), long_name(600, 's');
-    write_text(file_, before);
-    for (const char* section : {static_cast<const char*>(nullptr), "", "a b", "..", "S/", long_name.c_str()})
-        EXPECT_EQ(object.writeAuxiliaryFile(file_.c_str(), 1, section), 1);
-    EXPECT_EQ(object.writeAuxiliaryFile(folder_.file(long_name).c_str(), 1, "S"), 1);
-    EXPECT_EQ(object.writeAuxiliaryFile(nullptr, 1, "S"), 1);
-    EXPECT_FALSE(object.readAuxiliaryFile(nullptr, 1, "Shelf"));
-    EXPECT_EQ(read_text(file_), before);
 }
 
 TEST_F(Registry, FindsTheConfigurationFile) {
