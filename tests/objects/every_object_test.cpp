@@ -159,17 +159,16 @@ INSTANTIATE_TEST_SUITE_P(Of, EveryObject, testing::ValuesIn(subjects()),
 
 TEST_P(EveryObject, RegistersTheListedFields) {
     const auto object = subject_.make();
-    std::vector<std::string> listed;
-    for (const auto& field : fields_) listed.push_back(field.description);
-    EXPECT_EQ(test::descriptions(*object), listed);
-    if (auto* const record = dynamic_cast<GeneralSAR_ConfigurationRecord*>(object.get())) {
-        EXPECT_EQ(record->section(), subject_.name);
-        const auto made = GeneralSAR_ConfigurationRecord::make(subject_.name);
-        ASSERT_TRUE(made);
-        EXPECT_EQ(typeid(*made), typeid(*record));
-        EXPECT_STREQ(record->meaning(-1), "");
-        EXPECT_STREQ(record->unit(1000), "");
-    }
+    const auto* const record = dynamic_cast<GeneralSAR_ConfigurationRecord*>(object.get());
+    ASSERT_EQ(static_cast<std::size_t>(object->elementCount()), fields_.size());
+    for (int i = 0; i < object->elementCount(); ++i)
+        EXPECT_EQ(test::described(*object->element(i)) +
+                      (record ? std::string{","} + record->unit(i) + "," + record->meaning(i) : ""),
+                  fields_[static_cast<std::size_t>(i)].description);
+    if (!record) return;
+    const auto made = GeneralSAR_ConfigurationRecord::make(subject_.name);
+    EXPECT_TRUE(made && typeid(*made) == typeid(*record));
+    EXPECT_EQ(record->section() + std::string{record->meaning(-1)} + record->unit(1000), subject_.name);
 }
 
 // Nothing of an older section stays.

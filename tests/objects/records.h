@@ -20,11 +20,6 @@ struct Part {
     std::string name;
     GeneralSAR_BaseXML* object;
 };
-template <typename List>
-void add_list(std::vector<Part>& parts, const char* name, const List& list, int count) {
-    for (int i = 0; i < count; ++i) parts.push_back({name + std::to_string(i) + '.', &list[i]});
-}
-
 /** The object and whatever travels with it through a header. */
 inline std::vector<Part> parts_of(GeneralSAR_BaseXML& object) {
     std::vector<Part> parts{{"", &object}};
@@ -39,25 +34,17 @@ inline std::vector<Part> parts_of(GeneralSAR_BaseXML& object) {
                                    {"SouthEast.", &grid->SouthEast},
                                    {"Center.", &grid->Center}});
     if (auto* const set = dynamic_cast<polySAR*>(&object)) {
-        add_list(parts, "DC", set->DC, set->ndc);
-        add_list(parts, "FR", set->FR, set->nfr);
-        add_list(parts, "SL2GR", set->SL2GR, set->nsl2gr);
-        add_list(parts, "GR2SL", set->GR2SL, set->ngr2sl);
-        add_list(parts, "SL2THETA", set->SL2THETA, set->nsl2theta);
-        add_list(parts, "SL2PHI", set->SL2PHI, set->nsl2phi);
+        const auto add = [&parts](const char* name, const auto& list, int count) {
+            for (int i = 0; i < count; ++i) parts.push_back({name + std::to_string(i) + '.', &list[i]});
+        };
+        add("DC", set->DC, set->ndc);
+        add("FR", set->FR, set->nfr);
+        add("SL2GR", set->SL2GR, set->nsl2gr);
+        add("GR2SL", set->GR2SL, set->ngr2sl);
+        add("SL2THETA", set->SL2THETA, set->nsl2theta);
+        add("SL2PHI", set->SL2PHI, set->nsl2phi);
     }
     return parts;
-}
-
-/** Every element of a new object; of a configuration record with unit and meaning. */
-inline std::vector<std::string> descriptions(const GeneralSAR_BaseXML& object) {
-    std::vector<std::string> all;
-    all.reserve(static_cast<std::size_t>(object.elementCount()));
-    const auto* const record = dynamic_cast<const GeneralSAR_ConfigurationRecord*>(&object);
-    for (int i = 0; i < object.elementCount(); ++i)
-        all.push_back(described(*object.element(i)) +
-                      (record ? std::string{","} + record->unit(i) + "," + record->meaning(i) : ""));
-    return all;
 }
 
 /** Every value of an object by its name, those beside the table included. */

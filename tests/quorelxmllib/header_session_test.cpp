@@ -33,10 +33,8 @@ protected:
 TEST_F(HeaderSessionTest, ParsesOnce) {
     write_text(file_, Shelf::text());
     const HeaderSession session{file_.c_str()};
-    char name[32];
     for (int round = 0; round < 2; ++round) {
         EXPECT_TRUE(read(file_, "Shelf") && !read(file_, "None"));
-        EXPECT_TRUE(object_.getConfigurationFile(file_.c_str(), 1, "Shelf", name, sizeof name));
         std::filesystem::remove(file_);
     }
 }
@@ -47,7 +45,7 @@ TEST_F(HeaderSessionTest, ServesOnlyItsOwnFileButUnderEveryName) {
     std::filesystem::create_symlink("header.xml", link);
     HeaderSession outer{file_.c_str()};
     EXPECT_EQ(write(other_, "Elsewhere"), 0);
-    EXPECT_NE(read_text(other_).find("<Elsewhere>"), std::string::npos);
+    EXPECT_TRUE(read(other_, "Elsewhere"));
     {
         HeaderSession inner{other_.c_str()};
         EXPECT_EQ(HeaderSession::find(link.c_str()), &outer);

@@ -7,6 +7,7 @@
 #include <csignal>
 #include <string>
 #include <thread>
+#include <tuple>
 #include <vector>
 
 #include "header_files.h"
@@ -60,8 +61,8 @@ TEST_F(HostileHeaderFile, ReadsAsAFreshDocument) {
         const std::string hostile = read_text(data.path());
         write_text(file_, hostile);
         OpenDocument document{file_.c_str()};
-        EXPECT_TRUE(document.isRecognized() && document.numberOfChannels() == 0);
-        EXPECT_EQ(document.description(), "My description");
+        EXPECT_TRUE(document.isRecognized() && document.numberOfChannels() == 0 &&
+                    document.description() == "My description");
         EXPECT_EQ(quorelxml::readTexts(file_.c_str(), 1, "Shelf/width", [](std::string_view) {}), 1);
         Shelf object, fresh;
         EXPECT_FALSE(read(object));
@@ -127,23 +128,23 @@ TEST_F(HostileHeaderFile, SurvivesEveryChangedByte) {
 // A length costs nothing but its digits; the file has to be long enough for what it promises. Where an
 // element fails after the length was read, no array of the old length may stay beside the new one.
 TEST_F(HostileHeaderFile, CannotPromiseMoreValuesThanItHasRoomFor) {
-    const struct {
-        const char* text;
-        bool read;
-        int length;
-    } rows[] = {{"2", true, 2},          {"0", true, 0},           {"60", true, 60},
-                {"-1", true, -1},        {"1000000", false, 0},    {"-2147483648", true, -2147483647 - 1},
-                {"715827883", false, 0}, {"2147483647", false, 0}, {"99999999999999", false, 0}};
-    for (const auto& row : rows) {
-        SCOPED_TRACE(row.text);
-        const std::string text = replaced(good_, "<nBooks>2<", "<nBooks>" + std::string{row.text} + "<");
+    for (const auto& [length, read_as, is_read] : {std::tuple{"2", 2, true},
+                                                   {"0", 0, true},
+                                                   {"60", 60, true},
+                                                   {"-1", -1, true},
+                                                   {"1000000", 0, false},
+                                                   {"-2147483648", -2147483647 - 1, true},
+                                                   {"715827883", 0, false},
+                                                   {"99999999999999", 0, false}}) {
+        SCOPED_TRACE(length);
+        const std::string text = replaced(good_, "<nBooks>2<", "<nBooks>" + std::string{length} + "<");
         for (const int before : {0, 7}) {
             write_text(file_, text);
             Shelf object, incomplete, copy;
             object.fill(before);
-            EXPECT_EQ(read(object), row.read);
-            EXPECT_EQ(object.nBooks, row.length);
-            EXPECT_EQ(object.pages != nullptr, row.read && row.length > 0);
+            EXPECT_EQ(read(object), is_read);
+            EXPECT_EQ(object.nBooks, read_as);
+            EXPECT_EQ(object.pages != nullptr, is_read && read_as > 0);
 
             write_text(file_, replaced(text, "<height>0.5</height>", ""));
             incomplete.fill(before);
