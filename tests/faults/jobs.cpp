@@ -7,7 +7,7 @@
 #include <memory>
 #include <ostream>
 
-#include "objects/products.h"
+#include "objects/records.h"
 #include "quo_base/Coregist.h"
 #include "quo_base/MatrixAlgebraANSI.h"
 #include "quo_base/ckerr.h"

@@ -9,7 +9,7 @@
 #include <string>
 #include <vector>
 
-#include "objects/products.h"
+#include "objects/records.h"
 #include "quo_base/profile.h"
 #include "support/diagnostics.h"
 

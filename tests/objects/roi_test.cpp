@@ -62,8 +62,8 @@ TEST(Roi, GivesTheNearestIndexWithHalvesAwayFromZero) {
         const double start = std::stod(row[0]), delta = std::stod(row[1]), length = std::stod(row[2]) * delta;
         ROI_Obj roi;
         roi.SetFastAxe(start, delta, 17);
-        roi.SetSlowAxe(start, delta, 13);
-        for (const int index : {roi.GetFastIndex(start + length), roi.GetSlowIndex(start + length),
+        roi.SetSlowAxe(start + 17.0, delta, 13);
+        for (const int index : {roi.GetFastIndex(start + length), roi.GetSlowIndex(start + 17.0 + length),
                                 roi.GetFastRange(length), roi.GetSlowRange(length)})
             EXPECT_EQ(index, std::stoi(row[3])) << row[2] << " of " << row[1];
     }

@@ -16,9 +16,9 @@
 #include <utility>
 #include <vector>
 
-#include "escapes.h"
 #include "quo_base/profile.h"
 #include "support/diagnostics.h"
+#include "support/escapes.h"
 
 namespace {
 

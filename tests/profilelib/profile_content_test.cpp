@@ -7,9 +7,9 @@
 #include <string>
 #include <string_view>
 
-#include "escapes.h"
 #include "profile_property.h"
 #include "support/diagnostics.h"
+#include "support/escapes.h"
 
 namespace {
 

@@ -1,5 +1,5 @@
-#ifndef QUO_TESTS_ESCAPES_H
-#define QUO_TESTS_ESCAPES_H
+#ifndef QUO_TESTS_SUPPORT_ESCAPES_H
+#define QUO_TESTS_SUPPORT_ESCAPES_H
 
 #include <string>
 #include <string_view>
