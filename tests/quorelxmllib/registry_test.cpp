@@ -3,6 +3,7 @@
 
 #include <functional>
 #include <string>
+#include <tuple>
 #include <utility>
 #include <vector>
 
@@ -18,8 +19,11 @@ using test::write_text;
 /** A header class whose registration and allocation the test decides. */
 class Free : public GeneralSAR_Base {
 public:
+    using GeneralSAR_Base::addElementDouble;
+    using GeneralSAR_Base::addElementFloat;
     using GeneralSAR_Base::addElementInt;
     using GeneralSAR_Base::addElementString;
+    using GeneralSAR_Base::addElementText;
     using GeneralSAR_Base::createElementsVector;
     using GeneralSAR_Base::destroyElementsVector;
     using GeneralSAR_Base::setAllocationFlag;
@@ -47,21 +51,42 @@ protected:
     Free object_;
 };
 
-// Whether an element is one value is fixed at its first registration. What else is stored is tested with the
-// classes, element by element.
+// Whether an element is one value is fixed at its first registration.
 TEST_F(Registry, StoresWhatIsRegistered) {
+    double d[3] = {};
+    float f = 0;
     int first = 1, second = 0;
-    make(3, [&](Free& self) {
-        EXPECT_EQ(self.addElementInt("first", &i_, first, 0, 0, true), 0);
-        EXPECT_EQ(self.addElementInt("second", &i_, second, 0, 0, true), 0);
-        EXPECT_EQ(self.addElementInt(std::string(100, 'n').c_str(), &i_, 1, 0, 0, true), 0);
+    char single[512] = "", other[20] = "";
+    char* many[2] = {single, single};
+    make(8, [&](Free& self) {
+        EXPECT_EQ(self.addElementDouble("d", d, 3, -1.5, 2.5, true) +
+                      self.addElementFloat("f", &f, 1, 0.25F, 0.5F, false) +
+                      self.addElementInt(std::string(100, 'n').c_str(), &i_, 1, -7, 2147483647, true) +
+                      self.addElementString("single", single, true) +
+                      self.addElementString("many", many, 2, false) +
+                      self.addElementText("other", other, sizeof other, false) +
+                      self.addElementInt("first", &i_, first, 0, 0, true) +
+                      self.addElementInt("second", &i_, second, 0, 0, true),
+                  0);
     });
     std::swap(first, second);
     for (int round = 0; round < 4; ++round) object_.registration(object_);  // into the same slots
-    const parElement &a = *object_.element(0), &b = *object_.element(1);
-    EXPECT_TRUE(a.count == 0 && a.scalar && b.count == 1 && !b.scalar && a.registered && b.registered);
-    EXPECT_EQ(object_.element(2)->name, std::string(63, 'n'));
-    EXPECT_TRUE(!object_.element(3) && !object_.element(-1) && object_.isBufferAllocated());
+    using Row = std::tuple<std::string, int, int, void*, double, double, bool, bool, std::size_t>;
+    const Row rows[] = {{"d", parElement::typeDouble, 3, d, -1.5, 2.5, true, false, 512},
+                        {"f", parElement::typeFloat, 1, &f, 0.25, 0.5, false, true, 512},
+                        {std::string(63, 'n'), parElement::typeInt, 1, &i_, -7, 2147483647, true, true, 512},
+                        {"single", parElement::typeString, 1, single, 0, 0, true, true, 512},
+                        {"many", parElement::typeString, 2, many, 0, 0, false, false, 512},
+                        {"other", parElement::typeString, 1, other, 0, 0, false, true, 20},
+                        {"first", parElement::typeInt, 0, &i_, 0, 0, true, true, 512},
+                        {"second", parElement::typeInt, 1, &i_, 0, 0, true, false, 512}};
+    for (int slot = 0; slot < object_.elementCount(); ++slot) {
+        const parElement& e = *object_.element(slot);
+        EXPECT_EQ(Row(e.name, e.type, e.count, e.pointer, e.minimum, e.maximum, e.mandatory, e.scalar, e.room),
+                  rows[slot]);
+        EXPECT_TRUE(e.registered);
+    }
+    EXPECT_TRUE(!object_.element(8) && !object_.element(-1) && object_.isBufferAllocated());
     parElement fresh;
     EXPECT_EQ(fresh.type, parElement::typeNone);
     for (const int count : {2, 1}) {  // open until it is marked registered
