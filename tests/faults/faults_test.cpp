@@ -178,7 +178,7 @@ pid_t Bench::start(const test::Fault& fault, bool endlessly) {
     if (!freopen(beside_.file("out").c_str(), "w", stdout) || !freopen(beside_.file("err").c_str(), "w", stderr))
         _exit(99);
     (void)std::setvbuf(stderr, nullptr, _IONBF, 0);  // for what is said on the way into a crash
-    if (job_.verb) be_tool();
+    if (!job_.verb.empty()) be_tool();
     be_library(fault, endlessly);
 }
 
@@ -249,7 +249,7 @@ std::string Bench::breach(const test::Fault& fault, const Outcome& outcome) cons
     if (claims && (now != fresh_ || outcome.output != whole_.output)) return "0 but not new";
     if (claims && outcome.reached && fault.call == Call::kSync && fault.error != EINTR)
         return "0 but not on the disk";
-    if (outcome.status != 0 && job_.verb &&
+    if (outcome.status != 0 && !job_.verb.empty() &&
         !testing::Matches(testing::MatchesRegex("quo: [^\n]*\n"))(outcome.said))
         return "says " + outcome.said;
     if (outcome.status != 0 && fault.call != Call::kOpen && job_.promise != Promise::kTells &&
@@ -334,7 +334,7 @@ TEST_P(Faults, LeaveOldOrNewAndSuccessMeansNew) {
     Bench bench{GetParam()};
     ASSERT_FALSE(HasFailure());
     for (const Failing& failing : kFailing) {
-        if (failing.call == Call::kMemory && GetParam().verb) continue;
+        if (failing.call == Call::kMemory && !GetParam().verb.empty()) continue;
         for (const int error : failing.errors)
             for (const bool forever : {false, true}) {
                 if (forever && (error == EINTR || error == test::kKill)) continue;
@@ -346,7 +346,7 @@ TEST_P(Faults, LeaveOldOrNewAndSuccessMeansNew) {
 TEST_P(Faults, LeaveAloneWhatCannotBeReplaced) {
     Bench bench{GetParam()};
     const Job& job = GetParam();
-    if (job.verb || job.promise == Promise::kUnchanged || job.promise == Promise::kSurvives) return;
+    if (!job.verb.empty() || job.promise == Promise::kUnchanged || job.promise == Promise::kSurvives) return;
     for (const Obstacle& obstacle : kObstacles) EXPECT_EQ(bench.breach_at(obstacle), "") << obstacle.name;
 }
 INSTANTIATE_TEST_SUITE_P(Jobs, Faults, testing::ValuesIn(test::jobs()),

@@ -1,6 +1,5 @@
 #include "faults/jobs.h"
 
-#include <algorithm>
 #include <array>
 #include <cmath>
 #include <cstdlib>
@@ -8,7 +7,7 @@
 #include <memory>
 #include <ostream>
 
-#include "objects/products.h"
+#include "objects/records.h"
 #include "quo_base/Coregist.h"
 #include "quo_base/MatrixAlgebraANSI.h"
 #include "quo_base/ckerr.h"
@@ -59,11 +58,7 @@ Run read_product(Folder folder) {
         if ([&]() noexcept { return read->GSread(file); }() != 0) return 1;
         const auto there = test::present_in(*read);
         for (const GSObject object : there)
-            if (const auto wrong = test::differing_fields(*whole->GSget(object), *read->GSget(object));
-                !wrong.empty()) {
-                std::fprintf(stderr, "object %d: %s differs", object, wrong.front().c_str());
-                std::abort();
-            }
+            judged(0, test::differing_fields(*whole->GSget(object), *read->GSget(object)).empty());
         if (there != test::present_in(*whole)) return 1;
         return judged(0, test::differences(*whole, *read).empty());
     };
@@ -323,120 +318,62 @@ const char* test::file_in(const std::string& folder, const char* name) {
 void test::PrintTo(const Job& job, std::ostream* stream) { *stream << job.name; }
 
 const std::vector<test::Job>& test::jobs() {
-    static const std::vector<Job> kJobs = {
-        {"DataFileObject", kReports, write_object<gsDataFile>},
-        {"Roi", kReports, write_object<gsRoi>},
-        {"Polynomials", kOldOrNew, write_object<gsPolySAR>},
-        {"SamplingConstants", kOldOrNew, write_object<gsSamplingConstants>},
-        {"Orbit", kOldOrNew, write_object<gsOrbit>},
-        {"SwathInfo", kOldOrNew, write_object<gsSwathInfo>},
-        {"AntennaPattern", kOldOrNew, write_object<gsAntennaPattern>},
-        {"GeoCoords", kOldOrNew, write_object<gsGeoCoords>},
-        {"BufferFileObject", kOldOrNew, write_object<gsBufferFile>},
-        {"Coregistration", kReports, write_coregistration},
-        {"Product", kReports, write_product<kProduct>, nullptr, true},
-        {"NewProduct", kReports, write_product<kNewProduct>},
-        {"Configuration", kOldOrNew, write_configuration},
-        {"CalibrationFactor", kOldOrNew, write_factor},
-        {"Document", kOldOrNew, with_document<quorelxml, add_values>},
-        {"Description", kOldOrNew, describe},
-        {"StyleSheet", kOldOrNew, with_document<quorelxmlPi, add_instruction>},
-        {"Profile", kOldOrNew, with_profile<set_and_sync>, nullptr, true},
-        {"AllProfiles", kOldOrNew, with_profile<delete_and_sync_all>},
-        {"ProfileCopy", kSilent, copy_profile},
-        {"SideFile", kOldOrNew, describe_raster},
-        {"DataFileCopy", kOldOrNew, copy_raster<DataFile, kOldRaster>, nullptr, true},
-        {"DataFileCopyToNew", kOldOrNew, copy_raster<DataFile, kNewRaster>},
-        {"BufferFileCopy", kOldOrNew, copy_raster<BufferFile, kOldRaster>},
-        {"Raster", kTells, write_raster<1, 0>},
-        {"BufferedRaster", kTells, write_raster<2, 48>},
-        {"StreamedRaster", kTells, write_stream<0>},
-        {"BufferedStream", kTells, write_stream<48>},
-        {"UpdatedRaster", kTells, update_raster},
-        {"BufferFileMade", kOldOrNew, make_raster},
-        {"Chirp", kTells, write_chirp},
-        {"Dump", kTells, dump},
-        {"Report", kSurvives, report},
-        {"ReadProduct", kUnchanged, read_product},
-        {"ReadOrbit", kUnchanged, use_orbit},
-        {"ReadDocument", kUnchanged, with_document<quorelxml, read_values>},
-        {"ReadProfile", kUnchanged, with_profile<read_keys>},
-        {"FallBack", kUnchanged, fall_back},
-        {"ReadRegion", kUnchanged, read_region},
-        {"Compute", kUnchanged, compute},
+    static const std::vector<Job> kJobs = [] {
+        std::vector<Job> jobs = {{"DataFileObject", kReports, write_object<gsDataFile>},
+                                 {"Roi", kReports, write_object<gsRoi>},
+                                 {"Polynomials", kOldOrNew, write_object<gsPolySAR>},
+                                 {"SamplingConstants", kOldOrNew, write_object<gsSamplingConstants>},
+                                 {"Orbit", kOldOrNew, write_object<gsOrbit>},
+                                 {"SwathInfo", kOldOrNew, write_object<gsSwathInfo>},
+                                 {"AntennaPattern", kOldOrNew, write_object<gsAntennaPattern>},
+                                 {"GeoCoords", kOldOrNew, write_object<gsGeoCoords>},
+                                 {"BufferFileObject", kOldOrNew, write_object<gsBufferFile>},
+                                 {"Coregistration", kReports, write_coregistration},
+                                 {"Product", kReports, write_product<kProduct>, true},
+                                 {"NewProduct", kReports, write_product<kNewProduct>},
+                                 {"Configuration", kOldOrNew, write_configuration},
+                                 {"CalibrationFactor", kOldOrNew, write_factor},
+                                 {"Document", kOldOrNew, with_document<quorelxml, add_values>},
+                                 {"Description", kOldOrNew, describe},
+                                 {"StyleSheet", kOldOrNew, with_document<quorelxmlPi, add_instruction>},
+                                 {"Profile", kOldOrNew, with_profile<set_and_sync>, true},
+                                 {"AllProfiles", kOldOrNew, with_profile<delete_and_sync_all>},
+                                 {"ProfileCopy", kSilent, copy_profile},
+                                 {"SideFile", kOldOrNew, describe_raster},
+                                 {"DataFileCopy", kOldOrNew, copy_raster<DataFile, kOldRaster>, true},
+                                 {"DataFileCopyToNew", kOldOrNew, copy_raster<DataFile, kNewRaster>},
+                                 {"BufferFileCopy", kOldOrNew, copy_raster<BufferFile, kOldRaster>},
+                                 {"Raster", kTells, write_raster<1, 0>},
+                                 {"BufferedRaster", kTells, write_raster<2, 48>},
+                                 {"StreamedRaster", kTells, write_stream<0>},
+                                 {"BufferedStream", kTells, write_stream<48>},
+                                 {"UpdatedRaster", kTells, update_raster},
+                                 {"BufferFileMade", kOldOrNew, make_raster},
+                                 {"Chirp", kTells, write_chirp},
+                                 {"Dump", kTells, dump},
+                                 {"Report", kSurvives, report},
+                                 {"ReadProduct", kUnchanged, read_product},
+                                 {"ReadOrbit", kUnchanged, use_orbit},
+                                 {"ReadDocument", kUnchanged, with_document<quorelxml, read_values>},
+                                 {"ReadProfile", kUnchanged, with_profile<read_keys>},
+                                 {"FallBack", kUnchanged, fall_back},
+                                 {"ReadRegion", kUnchanged, read_region},
+                                 {"Compute", kUnchanged, compute}};
 #ifdef QUO_TOOL
-        {"set", kOldOrNew, nullptr, "set @/product.hdr SamplingConstants/prf_hz 17.3"},
-        {"derive", kOldOrNew, nullptr, "derive @/scene.xml --what fr --replace"},
-        {"config", kOldOrNew, nullptr, "config new AzimuthConf -o @/product.hdr --replace"},
-        {"coregister", kOldOrNew, nullptr, "coregister @/scene.xml @/scene.xml -o @/product.hdr"},
-        {"convert", kOldOrNew, nullptr, "convert @/in.raw @/new.raw"},
-        {"convert_over", kOldOrNew, nullptr, "convert @/in.raw @/out.raw"},
-        {"convert_in_place", kOldOrNew, nullptr, "convert @/in.raw @/in.raw --order m"},
-        {"resample", kOldOrNew, nullptr, "resample @/in.raw @/out.raw --lines 9"},
-        {"quicklook", kOldOrNew, nullptr, "quicklook @/in.raw @/out.png", true},
-        {"spectrum", kOldOrNew, nullptr, "spectrum @/in.raw @/out.png"},
-        {"vrt", kOldOrNew, nullptr, "vrt @/in.raw"},
-        {"geolocate", kOldOrNew, nullptr,
-         "geolocate @/scene.xml --to ground --input @/points.csv --output @/out.csv"},
-        {"footprint", kUnchanged, nullptr, "footprint @/scene.xml"},
-        {"orbit", kUnchanged, nullptr, "orbit @/scene.xml"},
-        {"info", kUnchanged, nullptr, "info @/in.raw.hdr"},
+        for (const auto& row : read_table("fault_verbs.txt", '|'))
+            jobs.push_back({row[0], row[1] == "reads" ? kUnchanged : kOldOrNew, nullptr,
+                            row[1].find("killed") != row[1].npos, row[2]});
 #endif
-    };
+        return jobs;
+    }();
     return kJobs;
 }
 
-namespace {
-
-/** A header with more names than the first room of the parser's dictionary, and a description that needs memory of
- * its own. */
-std::string header_of_names() {
-    std::string text = "<QuorelXmlDoc><NumberOfChannels>1</NumberOfChannels><Description>" +
-                       std::string(100, 'd') + "</Description><Channel Number=\"1\">";
-    for (int i = 0; i < 60; ++i) {
-        const std::string name = "AnElementWithALongNameOfItsOwn" + std::to_string(i);
-        text.append("<").append(name).append(">1</").append(name).append(">");
-    }
-    return text + "</Channel></QuorelXmlDoc>";
-}
-
-}  // namespace
-
+// Among them a header with more names than the first room of the parser's dictionary, and a description that needs
+// memory of its own.
 void test::lay_out(const std::string& folder) {
-    const auto write = [&](const char* name, std::string_view text) { write_text(folder + '/' + name, text); };
-    const auto whole = product();
-    whole->GSwrite(file_in(folder, "whole.hdr"));
-    for (const GSObject object : all_objects()) whole->GSdisable(object);
-    for (const GSObject object : {gsSamplingConstants, gsRoi}) whole->GSenable(object);
-    whole->GSwrite(file_in(folder, "product.hdr"));
-    std::string other = read_text(folder + "/product.hdr");
-    std::replace(other.begin() + static_cast<std::ptrdiff_t>(other.find("<QuorelXmlDoc>")), other.end(), '8', '9');
-    write("product.hdr", other);
-    write("scene.xml", read_text(kScenes[0].path(".xml")));
-    write("names.hdr", header_of_names());
-    write("a.par", "\n[s]\nk = 1\n\n[t]\nlist = {17 29}\n");
-    write("points.csv", "azimuth_time_s,range_time_s\n1167930360,0.0054\n");
-    for (const char* name : {"out.png", "out.csv", "in.raw.vrt", "report", "progress"}) write(name, "older");
+    for (const auto& file : std::filesystem::directory_iterator{QUO_TEST_DATA "/faults"})
+        write_text(folder + '/' + file.path().filename().string(), read_text(file.path()));
+    write_text(folder + "/scene.xml", read_text(kScenes[0].path(".xml")));
     std::filesystem::permissions(folder + "/a.par", std::filesystem::perms{0640});
-
-    GeneralSAR_configuration records;
-    records.azimuth.writepar(file_in(folder, "records.xml"), 1);
-    CoherenceConf{}.writepar(file_in(folder, "records.xml"), 1);
-
-    GeneralSAR stripmap;
-    using Info = DataSetInfo_Obj;
-    stripmap.dataSetInfo.SetType(Info::dsAzimuthFocused, Info::dsAsar, Info::dsStripmap, Info::dsSlantRange,
-                                 Info::dsVoltComplex, Info::dsRefSysUndefined);
-    stripmap.GSenable(gsDataSetInfo);
-    stripmap.GSenable(gsSamplingConstants);
-    std::snprintf(stripmap.dataSetInfo.Polarization, 512, "H/H");
-    std::snprintf(stripmap.dataSetInfo.Swath, 512, "IS1");
-    stripmap.GSwrite(file_in(folder, "stripmap.hdr"));
-
-    const auto in = raster<DataFile>(folder, "in.raw"), out = raster<DataFile>(folder, "out.raw");
-    out->CellType = INT32;
-    for (const auto& made : {in, out}) {
-        write_text(made->FileName, raster_bytes(*made));
-        made->write_hdr();
-    }
 }

@@ -23,8 +23,8 @@ struct Job {
     std::string name;
     Promise promise = Promise::kOldOrNew;
     Run (*prepare)(const std::string& folder) = nullptr;  ///< does what is to be done without faults
-    const char* verb = nullptr;                           ///< a run of the tool instead; "@" stands for the folder
     bool killed = false;                                  ///< whether it is killed at random as well
+    std::string verb = {};                                ///< a run of the tool instead; "@" stands for the folder
 };
 const std::vector<Job>& jobs();
 void PrintTo(const Job& job, std::ostream* stream);

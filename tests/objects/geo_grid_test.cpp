@@ -9,38 +9,36 @@
 
 #include "objects/records.h"
 #include "support/diagnostics.h"
+#include "support/scenes.h"
 
 namespace {
 
-using testing::ElementsAre;
+using testing::Each, testing::ElementsAre;
 
+// What else may be missing is tested with every object.
 TEST(GeoGrid, KeepsAPointThatIsMissing) {
-    const test::Report report;
-    const std::string file = report.file("header.xml");
+    const test::TemporaryFolder folder;
+    const std::string file = folder.file("header.xml");
     geoCoords_Obj source, target;
     test::fill(source);
-    ASSERT_EQ(source.writehdr(file.c_str()), 0);
-    EXPECT_EQ(source.writehdr(report.file("no_such_folder/header.xml").c_str()), 1);
-    EXPECT_GE(report.entries("ERROR_CALL_TREE").size(), 1U);
-    test::write_text(file, test::without_element(test::read_text(file), "SouthWest"));
+    const std::string whole = test::read_text(QUO_TEST_DATA "/objects/geoCoords_Obj.xml");
+    test::write_text(file, test::without_element(whole, "SouthWest"));
     EXPECT_EQ(target.readhdr(file.c_str()), 0);
     EXPECT_THAT(test::differences(source, target), ElementsAre("SouthWest.Point", "SouthWest.members"));
     EXPECT_EQ(target.SouthWest.Latitude, -999.0);
 }
 
 TEST(GeoGrid, KeepsTheRasterInItsSideFile) {
-    const test::Report report;
-    const std::string header = report.file("scene.xml"), raster = report.file("scene");
-    GSDataFile_Obj source, target, copy;
+    const test::TemporaryFolder folder;
+    const std::string header = folder.file("scene.xml"), raster = folder.file("scene");
+    GSDataFile_Obj source, target, copy, none;
     test::fill(source);
     source.File.setFilename("of another name");
     EXPECT_EQ(source.writehdr(header.c_str()), 0);
     EXPECT_STREQ(source.File.FileName, "of another name");
-    EXPECT_FALSE(std::filesystem::exists(header));
-    EXPECT_TRUE(std::filesystem::exists(raster + ".hdr"));
+    EXPECT_TRUE(std::filesystem::exists(raster + ".hdr") && !std::filesystem::exists(header));
     EXPECT_EQ(target.readhdr(header.c_str()) + target.clone(&copy), 0);
     EXPECT_EQ(copy.File.FileName, raster);
-    GSDataFile_Obj none;
     for (const char* name : {".hdr", "abc"}) EXPECT_EQ(none.readhdr(name) + none.writehdr(name), 0);
     EXPECT_STREQ(none.File.FileName, "");
     EXPECT_FALSE(std::filesystem::exists(".hdr"));
@@ -56,16 +54,66 @@ TEST(Geopoint, TakesItsArrayWhateverTheFileHas) {
     const test::TemporaryFolder folder;
     const std::string file = folder.file("points.par");
     test::write_text(file, "[Coordinates]\nSouthEast = {44.21 8.03}\n");
-    for (const char* name : {"Center", "", "no/such point", static_cast<const char*>(nullptr)}) {
+    for (const char* name : {"Center", "", "no/such point", static_cast<const char*>(nullptr), "SouthEast"}) {
         geopoint point;
         point.Latitude = 45.37;
         EXPECT_EQ(point.readhdr(file.c_str(), name), 0);
-        EXPECT_THAT(members(point), testing::Each(-999.0));
+        const bool there = name && name == std::string_view{"SouthEast"};
+        EXPECT_THAT(members(point), ElementsAre(there ? 44.21 : -999.0, there ? 8.03 : -999.0, -999, -999, -999));
     }
-    geopoint point;
-    EXPECT_EQ(point.readhdr(file.c_str(), "SouthEast"), 0);
-    EXPECT_THAT(members(point), ElementsAre(44.21, 8.03, -999.0, -999.0, -999.0));
-    for (const char* name : {"", "North West", "<x>"}) EXPECT_EQ(point.writehdr(file.c_str(), name), 1) << name;
+    for (const char* name : {"", "North West", "<x>"})
+        EXPECT_EQ(geopoint{}.writehdr(file.c_str(), name), 1) << name;
+}
+
+// --- the corners of a region, as an orbit sees them -----------------------------------------------------------
+
+class GeoCoords : public testing::TestWithParam<test::Scene> {
+protected:
+    void SetUp() override {
+        test::load_orbit(GetParam(), orbit_);
+        const test::Extent extent = test::extent_of(test::load_tie_points(GetParam()));
+        roi_.Roi.SlowStartTime = extent.first_s;
+        roi_.Roi.SlowTimeLength = extent.last_s - extent.first_s;
+        roi_.Roi.FastStartTime = extent.near_s;
+        roi_.Roi.FastTimeLength = extent.far_s - extent.near_s;
+    }
+    /** The five values at a place of the region, from the orbit's own short forms. */
+    void expect(const geopoint& point, double along, double across) {
+        const double t = roi_.Roi.SlowStartTime + along * roi_.Roi.SlowTimeLength;
+        const double range = roi_.Roi.FastStartTime + across * roi_.Roi.FastTimeLength;
+        const double values[] = {orbit_.SVGetLat(t, range), orbit_.SVGetLon(t, range), 0.0,
+                                 orbit_.SVGetAnglesIncidence(t, range), orbit_.SVGetAnglesLook(t, range)};
+        EXPECT_THAT(point.Point, testing::ElementsAreArray(values));
+        EXPECT_THAT(members(point), testing::ElementsAreArray(values));
+    }
+    GeneralSAROrbit orbit_;
+    GSRoi_Obj roi_;
+    geoCoords_Obj grid_;
+};
+INSTANTIATE_TEST_SUITE_P(Scenes, GeoCoords, testing::ValuesIn(test::kScenes),
+                         [](const auto& row) { return row.param.name; });
+
+TEST_P(GeoCoords, AreTheRegionsCornersByOrbitDirection) {
+    ASSERT_EQ(orbit_.SVGetGeoCoords(&grid_, &roi_), 0);
+    const double up = orbit_.isAscending() ? 1.0 : 0.0, down = 1.0 - up;
+    expect(grid_.NorthWest, up, down);
+    expect(grid_.NorthEast, up, up);
+    expect(grid_.SouthWest, down, down);
+    expect(grid_.SouthEast, down, up);
+    expect(grid_.Center, 0.5, 0.5);
+    if (orbit_.getLookSign() < 0) return;  // the names are right for a platform that looks to the right
+    EXPECT_GT(grid_.NorthWest.Latitude, grid_.SouthWest.Latitude);
+    EXPECT_LT(grid_.NorthWest.Longitude, grid_.NorthEast.Longitude);
+}
+
+// The far range fails at once: the near corner before it is filled, the others are as they were.
+TEST_P(GeoCoords, KeepThePointsBeforeAFailure) {
+    roi_.Roi.FastTimeLength = 1000.0;
+    EXPECT_NE(orbit_.SVGetGeoCoords(&grid_, &roi_), 0);
+    expect(orbit_.isAscending() ? grid_.SouthWest : grid_.NorthEast, 0.0, 0.0);
+    EXPECT_THAT(grid_.Center.Point, Each(-999.0));
+    EXPECT_EQ(GeneralSAROrbit{}.SVGetGeoCoords(&grid_, &roi_), 1);
+    EXPECT_EQ(orbit_.SVGetGeoCoords(nullptr, &roi_) + orbit_.SVGetGeoCoords(&grid_, nullptr), 2);
 }
 
 }  // namespace

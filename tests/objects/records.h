@@ -20,11 +20,6 @@ struct Part {
     std::string name;
     GeneralSAR_BaseXML* object;
 };
-template <typename List>
-void add_list(std::vector<Part>& parts, const char* name, const List& list, int count) {
-    for (int i = 0; i < count; ++i) parts.push_back({name + std::to_string(i) + '.', &list[i]});
-}
-
 /** The object and whatever travels with it through a header. */
 inline std::vector<Part> parts_of(GeneralSAR_BaseXML& object) {
     std::vector<Part> parts{{"", &object}};
@@ -39,25 +34,17 @@ inline std::vector<Part> parts_of(GeneralSAR_BaseXML& object) {
                                    {"SouthEast.", &grid->SouthEast},
                                    {"Center.", &grid->Center}});
     if (auto* const set = dynamic_cast<polySAR*>(&object)) {
-        add_list(parts, "DC", set->DC, set->ndc);
-        add_list(parts, "FR", set->FR, set->nfr);
-        add_list(parts, "SL2GR", set->SL2GR, set->nsl2gr);
-        add_list(parts, "GR2SL", set->GR2SL, set->ngr2sl);
-        add_list(parts, "SL2THETA", set->SL2THETA, set->nsl2theta);
-        add_list(parts, "SL2PHI", set->SL2PHI, set->nsl2phi);
+        const auto add = [&parts](const char* name, const auto& list, int count) {
+            for (int i = 0; i < count; ++i) parts.push_back({name + std::to_string(i) + '.', &list[i]});
+        };
+        add("DC", set->DC, set->ndc);
+        add("FR", set->FR, set->nfr);
+        add("SL2GR", set->SL2GR, set->nsl2gr);
+        add("GR2SL", set->GR2SL, set->ngr2sl);
+        add("SL2THETA", set->SL2THETA, set->nsl2theta);
+        add("SL2PHI", set->SL2PHI, set->nsl2phi);
     }
     return parts;
-}
-
-/** Every element of a new object; of a configuration record with unit and meaning. */
-inline std::vector<std::string> descriptions(const GeneralSAR_BaseXML& object) {
-    std::vector<std::string> all;
-    all.reserve(static_cast<std::size_t>(object.elementCount()));
-    const auto* const record = dynamic_cast<const GeneralSAR_ConfigurationRecord*>(&object);
-    for (int i = 0; i < object.elementCount(); ++i)
-        all.push_back(described(*object.element(i)) +
-                      (record ? std::string{","} + record->unit(i) + "," + record->meaning(i) : ""));
-    return all;
 }
 
 /** Every value of an object by its name, those beside the table included. */
@@ -141,6 +128,40 @@ inline void fill(GeneralSAR_BaseXML& object, int seed = 1) {
         pattern->PatternFile.NrOfPixelsPerLine = pattern->PatternSamples;
         pattern->PatternFile.CellType = FLOAT32;
     }
+}
+
+// --- whole products -----------------------------------------------------------------------------------------
+
+inline std::vector<GSObject> all_objects() {
+    std::vector<GSObject> objects(GeneralSAR::kObjects);
+    for (std::size_t i = 0; i < objects.size(); ++i) objects[i] = static_cast<GSObject>(i);
+    return objects;
+}
+inline std::vector<GSObject> present_in(const GeneralSAR& product) {
+    std::vector<GSObject> objects = all_objects();
+    std::erase_if(objects, [&](GSObject object) { return !product.GSexists(object); });
+    return objects;
+}
+
+/** "object.value" for everything in which two products differ. */
+inline std::vector<std::string> differences(GeneralSAR& a, GeneralSAR& b) {
+    std::vector<std::string> names;
+    for (const GSObject object : all_objects())
+        for (const std::string& value : differences(*a.GSget(object), *b.GSget(object)))
+            names.push_back(std::to_string(object) + '.' + value);
+    return names;
+}
+
+/** Fills every object with values of its own and enables it. What two of them share in a file is the same. */
+inline void fill_product(GeneralSAR& p) {
+    for (const GSObject object : all_objects()) {
+        fill(*p.GSget(object));
+        p.GSenable(object);
+    }
+    for (RasterDescription* raster :
+         {static_cast<RasterDescription*>(&p.dataFile.File), static_cast<RasterDescription*>(&p.bufferFile)})
+        raster->copyDescription(p.antennaPattern.PatternFile);
+    EXPECT_EQ(p.orbit.computeApproximateSV(), 0);
 }
 
 }  // namespace test

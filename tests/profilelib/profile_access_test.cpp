@@ -18,6 +18,7 @@
 
 #include "quo_base/profile.h"
 #include "support/diagnostics.h"
+#include "support/escapes.h"
 
 namespace {
 
@@ -50,39 +51,17 @@ protected:
     std::vector<std::string> warnings_;  // all that the report must hold in the end
 };
 
-struct IntList {
-    const char* value;
-    int count;
-    std::vector<int> read;  // what must have been read, enough or not
-};
-const IntList kIntLists[] = {
-    {"{ 1 2 3 }", 3, {1, 2, 3}},
-    {"4 5 6", 2, {4, 5}},
-    {"{1 2}", 3, {1, 2}},
-    {"{7 }", 2, {7}},
-    {" {7}", 1, {}},
-    {"{1\t \t2   3}", 3, {1, 2, 3}},
-    {"-17 +29", 2, {-17, 29}},
-    {"12abc 3,4 5.9", 3, {12, 3, 5}},
-    {"12 abc 3", 3, {12}},
-    {"1\n2 \r\n3", 2, {1, 3}},
-    {"010 0x10", 2, {10, 0}},
-    {"2147483648 -2147483649 99999999999999999999", 3, {INT32_MAX, INT32_MIN, INT32_MAX}},
-    {"", 1, {}},
-    {"x", 0, {}},
-    {"x", -3, {}},
-};
-
 TEST_F(ProfileAccess, ReadsIntsAsFarAsTheyGo) {
-    for (const IntList& list : kIntLists) {
-        std::vector<int> values(5, -803457), longs = values, expected = list.read;
-        expected.resize(values.size(), -803457);
-        const int status = static_cast<int>(list.read.size()) < list.count ? 10 : 0;
-        store(list.value);
-        EXPECT_EQ(GetMyProfileIntArray(kSection, kKey, values.data(), list.count, file()), status) << list.value;
-        EXPECT_EQ(GetMyProfileLongArray(kSection, kKey, longs.data(), list.count, file()), status) << list.value;
-        EXPECT_TRUE(values == expected && longs == expected) << list.value;
-        for (int twice = 0; status != 0 && twice < 2; ++twice) expect_warning(list.read.size(), list.count);
+    for (const auto& row : test::read_table("profile/ints.txt", '|')) {
+        std::vector<int> values(5, -803457), longs = values, expected = values;
+        for (std::size_t i = 2; i < row.size(); ++i) expected[i - 2] = std::stoi(row[i]);
+        const int count = std::stoi(row[1]), read = static_cast<int>(row.size()) - 2,
+                  status = read < count ? 10 : 0;
+        store(test::unescaped(row[0]).c_str());
+        EXPECT_EQ(GetMyProfileIntArray(kSection, kKey, values.data(), count, file()), status) << row[0];
+        EXPECT_EQ(GetMyProfileLongArray(kSection, kKey, longs.data(), count, file()), status) << row[0];
+        EXPECT_TRUE(values == expected && longs == expected) << row[0];
+        for (int twice = 0; status != 0 && twice < 2; ++twice) expect_warning(row.size() - 2, count);
     }
 }
 
@@ -192,36 +171,16 @@ TEST_F(ProfileAccess, CopiesStringsWithinTheirRoom) {
     }
 }
 
-struct StringList {
-    const char* value;
-    int count, status;
-    std::vector<std::string> read;
-};
-const StringList kStringLists[] = {
-    {R"({ "{b}""c d " ""})", 3, 0, {"{b}", "c d ", ""}},
-    {R"({"ab" "c"})", 1, 0, {"ab"}},
-    {R"({"ab")", 1, 0, {"ab"}},
-    {R"({"ab" "c"})", 3, 2, {"ab", "c"}},  // a brace ends the list: its length is the status
-    {"{}", 3, 0, {}},
-    {R"({"ab" "c" )", 3, 10, {"ab", "c"}},
-    {R"({"ab" "c)", 2, 10, {"ab"}},
-    {R"("ab" "c")", 2, 0, {}},
-    {R"({"ab", "c"})", 2, 0, {"ab"}},
-    {"{\"ab\"\t\"c\"}", 2, 0, {"ab"}},
-    {R"({"ab"})", 0, 0, {}},
-    {"{", 1, 10, {}},
-    {"", 1, 0, {}},
-};
-
 TEST_F(ProfileAccess, ReadsStringsAsFarAsTheyGo) {
-    for (const StringList& list : kStringLists) {
+    for (const auto& row : test::read_table("profile/strings.txt", '|')) {
         std::vector<std::string> rooms(4, std::string(16, '#'));
         char* const strings[] = {rooms[0].data(), rooms[1].data(), rooms[2].data(), rooms[3].data()};
-        store(list.value);
-        EXPECT_EQ(GetMyProfileStringArray(kSection, kKey, strings, list.count, 16, file()), list.status);
+        store(test::unescaped(row[0]).c_str());
+        EXPECT_EQ(GetMyProfileStringArray(kSection, kKey, strings, std::stoi(row[1]), 16, file()),
+                  std::stoi(row[2]));
         for (std::size_t i = 0; i < rooms.size(); ++i)
-            EXPECT_STREQ(rooms[i].c_str(), i < list.read.size() ? list.read[i].c_str() : "################");
-        if (list.status == 10) expect_warning(list.read.size(), list.count);
+            EXPECT_STREQ(rooms[i].c_str(), i + 3 < row.size() ? row[i + 3].c_str() : "################") << row[0];
+        if (row[2] == "10") expect_warning(row.size() - 3, std::stoi(row[1]));
     }
 }
 

@@ -2,44 +2,30 @@
 
 #include <gtest/gtest.h>
 
+#include <optional>
 #include <random>
 #include <string>
 #include <string_view>
 
 #include "profile_property.h"
 #include "support/diagnostics.h"
+#include "support/escapes.h"
 
 namespace {
 
 using quo::ProfileContent;
 using namespace std::string_view_literals;
 
-/** What the lists that everything else is compared with must show too. */
-struct Line {
-    std::string_view text, section, key;
-    const char* value;  // null: not there
-};
-constexpr Line kLines[] = {
-    {"[s]\n   k j   =   a=b  c   ", "s", "k j", "a=b  c"},
-    {"[s]\nk\t= 1\r\n", "s", "k\t", "1\r"},
-    {"[s]\nk = 1\n\nj = 2\n", "s", "j", nullptr},
-    {"[s]\n# note\n\nj = 2\n", "s", "# note\n\nj", "2"},
-    {"[s]\nk = 1\n\n\n[t]\nj = 2\n", "t", "j", "2"},
-    {"[s]\n = k = 1\nabc[t]=1\nj = 2\n", "t", "j", "2"},
-    {"k = 1\n=\nnote [ a[=\nb ] x = 1 [t]\nk = 2\n", "a[=\nb", "k", "2"},
-    {"[s]\nk = 1\n[t\nj = 2\n", "t\nj = 2", "j", nullptr},
-    {"[s]\nx = 1\n[t]\nx = 3\n[s]\ny = 2\ny = 4", "s", "y", "4"},
-    {"[s]\nx = 1\n[t]\nx = 3\n[s]\ny = 2\ny = 4", "s", "x", "1"},
-    {"\0[s\0cd]\nk \0cd = ab \0cd\nj = 1\n"sv, "s", "k", "ab"},
-};
-
+// What the lists that everything else is compared with must show too.
 TEST(ProfileContent, FollowsItsGrammar) {
-    for (const Line& line : kLines) {
+    for (const auto& row : test::read_table("profile/grammar.txt", '|')) {
+        const std::string text = test::unescaped(row[0]), section = test::unescaped(row[1]),
+                          key = test::unescaped(row[2]);
+        const auto value = row.size() > 3 ? std::optional{test::unescaped(row[3])} : std::nullopt;
         ProfileContent content;
-        content.parse(std::string{line.text});
-        EXPECT_STREQ(content.find(line.section, line.key), line.value) << line.text;
-        EXPECT_EQ(property::ListModel{line.text}.get(line.section, line.key).value_or("none"),
-                  line.value ? line.value : "none");
+        content.parse(std::string{text});
+        EXPECT_STREQ(content.find(section, key), value ? value->c_str() : nullptr) << row[0];
+        EXPECT_EQ(property::ListModel{text}.get(section, key), value) << row[0];
     }
 }
 

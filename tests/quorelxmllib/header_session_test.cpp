@@ -1,6 +1,5 @@
 #include "quorelxmllib/header_session.h"
 
-#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -19,69 +18,45 @@ using test::write_text;
 class HeaderSessionTest : public testing::Test {
 protected:
     HeaderSessionTest() { object_.fill(3); }
-    int write(const std::string& file, const char* section, int channel = 1) {
-        return object_.writeAuxiliaryFile(file.c_str(), channel, section);
+    int write(const std::string& file, const char* section) {
+        return object_.writeAuxiliaryFile(file.c_str(), 1, section);
     }
     bool read(const std::string& file, const char* section) {
         return Shelf{}.readAuxiliaryFile(file.c_str(), 1, section);
     }
     test::TemporaryFolder folder_;
-    const std::string file_ = folder_.file("header.xml");
+    const std::string file_ = folder_.file("header.xml"), other_ = folder_.file("other.xml");
     Shelf object_;
 };
 
-// The same bytes must reach the disk in one save and object by object.
-TEST_F(HeaderSessionTest, WritesTheBytesOfObjectByObject) {
-    const auto write_product = [&](const std::string& file) {
-        for (const int books : {3, 7}) {
-            object_.fill(books);
-            for (const char* section : {"Library", "Library/Room-0", "Library/Room-1", "Shelf"})
-                EXPECT_EQ(write(file, section), 0);
-            EXPECT_EQ(write(file, "Shelf", 2), 0);
-        }
-    };
-    const std::string alone = folder_.file("alone.xml");
-    for (const std::string& text : {std::string{}, std::string{"<Other/>"}, Shelf::text()}) {
-        write_text(alone, text);
-        write_text(file_, text);
-        write_product(alone);
-        HeaderSession session{file_.c_str()};
-        write_product(file_);
-        EXPECT_EQ(read_text(file_), text) << "nothing is saved before the end";
-        EXPECT_EQ(session.commit(), 0);
-        EXPECT_EQ(read_text(file_), read_text(alone));
-    }
-}
-
+// That the same bytes reach the disk in one save and object by object is tested with the products.
 TEST_F(HeaderSessionTest, ParsesOnce) {
     write_text(file_, Shelf::text());
     const HeaderSession session{file_.c_str()};
-    char name[32];
     for (int round = 0; round < 2; ++round) {
         EXPECT_TRUE(read(file_, "Shelf") && !read(file_, "None"));
-        EXPECT_TRUE(object_.getConfigurationFile(file_.c_str(), 1, "Shelf", name, sizeof name));
         std::filesystem::remove(file_);
     }
 }
 
 TEST_F(HeaderSessionTest, ServesOnlyItsOwnFileButUnderEveryName) {
     write_text(file_, Shelf::text());
-    const std::string link = folder_.file("link.xml"), other = folder_.file("other.xml");
+    const std::string link = folder_.file("link.xml");
     std::filesystem::create_symlink("header.xml", link);
     HeaderSession outer{file_.c_str()};
-    EXPECT_EQ(write(other, "Elsewhere"), 0);
-    EXPECT_NE(read_text(other).find("<Elsewhere>"), std::string::npos);
+    EXPECT_EQ(write(other_, "Elsewhere"), 0);
+    EXPECT_TRUE(read(other_, "Elsewhere"));
     {
-        HeaderSession inner{other.c_str()};
+        HeaderSession inner{other_.c_str()};
         EXPECT_EQ(HeaderSession::find(link.c_str()), &outer);
-        EXPECT_EQ(HeaderSession::find(other.c_str()), &inner);
+        EXPECT_EQ(HeaderSession::find(other_.c_str()), &inner);
         EXPECT_EQ(write(folder_.path().string() + "/./header.xml", "A") + write(link, "B"), 0);
-        EXPECT_EQ(write(other, "Inner") + inner.commit(), 0);
+        EXPECT_EQ(write(other_, "Inner") + inner.commit(), 0);
         EXPECT_EQ(read_text(file_), Shelf::text());
     }
-    EXPECT_TRUE(!HeaderSession::find(other.c_str()) && !HeaderSession::find(nullptr));
+    EXPECT_TRUE(!HeaderSession::find(other_.c_str()) && !HeaderSession::find(nullptr));
     EXPECT_EQ(outer.commit(), 0);
-    EXPECT_TRUE(read(other, "Inner") && read(file_, "A") && read(file_, "B") && read(file_, "Shelf"));
+    EXPECT_TRUE(read(other_, "Inner") && read(file_, "A") && read(file_, "B") && read(file_, "Shelf"));
 }
 
 TEST_F(HeaderSessionTest, ShowsWhatWasWrittenAndTouchesNothingWithoutACommit) {
@@ -102,35 +77,30 @@ TEST_F(HeaderSessionTest, ShowsWhatWasWrittenAndTouchesNothingWithoutACommit) {
 // file that does not fit into memory, lets nothing be saved.
 TEST_F(HeaderSessionTest, SavesWholeObjectsOnly) {
     write_text(file_, Shelf::text());
-    const test::CapturedStderr quiet;
     HeaderSession session{file_.c_str()};
     object_.destroyBuffers();
     EXPECT_EQ(write(file_, "Shelf"), 1);
     object_.fill(1);
-    std::snprintf(object_.label, sizeof object_.label, "\x07");
+    object_.label[0] = '\x07';
     EXPECT_EQ(write(file_, "Shelf"), 1);
     for (const char* section : {"Other", "More"}) {  // a session may go on after it was saved
         object_.fill(1);
         EXPECT_EQ(write(file_, section) + session.commit(), 0);
-        EXPECT_TRUE(Shelf{}.readAuxiliaryFile(file_.c_str(), 1, section));
+        EXPECT_TRUE(read(file_, section) && read(file_, "Shelf"));
     }
-    EXPECT_TRUE(read(file_, "Shelf"));
-    const std::string before = read_text(file_);
+    const std::string before = read_text(file_), folder = folder_.path().string();
     EXPECT_EQ(write(file_, "Fine"), 0);
     EXPECT_EQ(write(file_, "not a name"), 1);
     EXPECT_EQ(session.commit(), 1);
     EXPECT_EQ(read_text(file_), before);
 
-    const std::string huge = test::replaced(Shelf::text(), "Novels", std::string(11'000'000, 'x')),
-                      other = folder_.file("huge.xml");
-    write_text(other, huge);
-    HeaderSession stand_in{other.c_str()};
-    EXPECT_FALSE(read(other, "Shelf"));
-    EXPECT_EQ(write(other, "Shelf"), 7);
-    EXPECT_EQ(stand_in.commit(), 7);
-    EXPECT_TRUE(read_text(other) == huge);
+    const std::string huge = test::replaced(Shelf::text(), "Novels", std::string(11'000'000, 'x'));
+    write_text(other_, huge);
+    HeaderSession stand_in{other_.c_str()};
+    EXPECT_FALSE(read(other_, "Shelf"));
+    EXPECT_EQ(write(other_, "Shelf") + stand_in.commit(), 2 * 7);
+    EXPECT_TRUE(read_text(other_) == huge);
     // A file that could not be read may have every section.
-    const std::string folder = folder_.path().string();
     HeaderSession unread{folder.c_str()};
     EXPECT_FALSE(read(folder, "Shelf"));
     EXPECT_EQ(unread.failures(), 1);

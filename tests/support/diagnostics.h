@@ -6,9 +6,9 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <charconv>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -16,6 +16,7 @@
 #include <stdexcept>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include "quo_base/ckerr.h"
@@ -60,6 +61,25 @@ inline void write_text(const std::filesystem::path& path, std::string_view text)
     errno = 0;
 }
 
+/** The lines of a table of the test data, each cut at the separator into at most `columns` texts. */
+inline std::vector<std::vector<std::string>> read_table(const std::string& name, char separator = ',',
+                                                        std::size_t columns = 100) {
+    std::istringstream lines{read_text(QUO_TEST_DATA + ("/" + name))};
+    EXPECT_NE(lines.str(), "") << name;
+    std::vector<std::vector<std::string>> rows;
+    for (std::string line; std::getline(lines, line);) {
+        if (line.starts_with('#')) continue;
+        std::vector<std::string>& row = rows.emplace_back();
+        for (auto end = line.find(separator); end != line.npos && row.size() + 1 < columns;
+             end = line.find(separator)) {
+            row.push_back(line.substr(0, end));
+            line.erase(0, end + 1);
+        }
+        row.push_back(line);
+    }
+    return rows;
+}
+
 /** Collects what is written to the standard error stream until text() is asked for or the object goes. */
 class CapturedStderr {
 public:
@@ -99,71 +119,43 @@ private:
     int original_ = -1;
 };
 
-/** One entry as it stands in a report. Call-tree lines carry no number (-1) and no message. */
+/** One entry as it stands in a report. Call-tree lines carry no message. */
 struct ReportEntry {
-    int number = -1;
     std::string kind, message, file, function;
     int line = 0;
 };
 
-/** Reads a report back. Of a message with line feeds only the first line is kept. */
-class ReportReader {
-public:
-    static std::vector<ReportEntry> read(const std::string& text) {
-        ReportReader reader;
-        std::istringstream lines{text};
-        for (std::string line; std::getline(lines, line);) reader.take(line);
-        return reader.entries_;
-    }
+/** What stands in a line between two texts, up to the last of the second; empty where they do not. */
+inline std::string between(std::string_view line, std::string_view before, std::string_view after) {
+    const auto start = line.find(before), end = line.rfind(after);
+    if (start == line.npos || end == line.npos || start + before.size() > end) return "";
+    return std::string{line.substr(start + before.size(), end - start - before.size())};
+}
 
-private:
-    static constexpr std::string_view kTree = "    . Call tree: FILE ", kPlace = "    . FILE ";
-
-    void take(std::string_view line) {
-        if (line.starts_with(kTree)) {
-            entries_.push_back({-1, "ERROR_CALL_TREE", "", "", "", 0});
-            take_place(line.substr(kTree.size()));
-        } else if (entries_.empty() || !line.starts_with("    ")) {
-            take_head(line);
-        } else if (line.starts_with(kPlace)) {
-            take_place(line.substr(kPlace.size()));
-        } else {
-            take_field(line);
-        }
+/** The entries of a report. Of a message with line feeds only the first line is kept. */
+inline std::vector<ReportEntry> entries_of(const std::string& report) {
+    std::vector<ReportEntry> entries;
+    std::istringstream lines{report};
+    for (std::string line; std::getline(lines, line);) {
+        // "3)  ERROR [12 sec]." or "3)  WARNING [12 sec]: message"
+        if (line[0] >= '0' && line[0] <= '9' && line.find(" sec]") != line.npos)
+            entries.push_back({between(line, ")  ", " ["), between(line + '\n', "]: ", "\n"), "", "", 0});
+        if (line.starts_with("    . Call tree: ")) entries.push_back({"ERROR_CALL_TREE", "", "", "", 0});
+        if (entries.empty() || !line.starts_with("    ")) continue;
+        ReportEntry& entry = entries.back();
+        if (line.starts_with("    . "))  // "    . FILE <file>, FUNCTION <function>, LINE <line>."
+            entry = {entry.kind, entry.message, between(line, "FILE ", ", FUNCTION "),
+                     between(line, ", FUNCTION ", ", LINE "), std::atoi(between(line, ", LINE ", ".").c_str())};
+        // The long form has a line for each.
+        for (const auto& [label, value] : {std::pair{"    FILE : ", &entry.file},
+                                           {"    FUNCTION : ", &entry.function},
+                                           {"    MESSAGE : ", &entry.message}})
+            if (line.starts_with(label))
+                *value = line.substr(std::strlen(label), line.size() - std::strlen(label) - 1);
+        if (line.starts_with("    LINE : ")) entry.line = std::atoi(line.c_str() + 11);
     }
-    void take_head(std::string_view line) {  // "3)  ERROR [12 sec]." or "3)  WARNING [12 sec]: message"
-        ReportEntry entry;
-        const auto [end, error] = std::from_chars(line.data(), line.data() + line.size(), entry.number);
-        std::string_view rest = line.substr(static_cast<std::size_t>(end - line.data()));
-        const auto bracket = rest.find(" [");
-        if (error != std::errc{} || !rest.starts_with(")  ") || bracket == rest.npos) return;
-        entry.kind = rest.substr(3, bracket - 3);
-        if (const auto colon = rest.find("]: "); colon != rest.npos) entry.message = rest.substr(colon + 3);
-        entries_.push_back(std::move(entry));
-    }
-    void take_place(std::string_view place) {  // "<file>, FUNCTION <function>, LINE <line>."
-        const auto function = place.find(", FUNCTION "), line = place.rfind(", LINE ");
-        if (function == place.npos || line == place.npos) return;
-        entries_.back().file = place.substr(0, function);
-        entries_.back().function = place.substr(function + 11, line - function - 11);
-        entries_.back().line = std::atoi(place.data() + line + 7);
-    }
-    void take_field(std::string_view line) {  // the lines of the long form
-        const auto value = [line](std::string_view label) {
-            return line.substr(label.size(), line.size() - label.size() - 1);
-        };
-        ReportEntry& entry = entries_.back();
-        if (constexpr std::string_view label = "    FILE : "; line.starts_with(label)) entry.file = value(label);
-        if (constexpr std::string_view label = "    FUNCTION : "; line.starts_with(label))
-            entry.function = value(label);
-        if (constexpr std::string_view label = "    LINE : "; line.starts_with(label))
-            entry.line = std::atoi(line.data() + label.size());
-        if (constexpr std::string_view label = "    MESSAGE : "; line.starts_with(label))
-            entry.message = value(label);
-    }
-
-    std::vector<ReportEntry> entries_;
-};
+    return entries;
+}
 
 /** Turns tracking on and opens a report in a folder of its own. When it goes, the report is closed, tracking ends
  * and the test fails if a tracked block is left. */
@@ -185,7 +177,7 @@ public:
     Report& operator=(const Report&) = delete;
 
     [[nodiscard]] std::string text() const { return read_text(name_); }
-    [[nodiscard]] std::vector<ReportEntry> entries() const { return ReportReader::read(text()); }
+    [[nodiscard]] std::vector<ReportEntry> entries() const { return entries_of(text()); }
     /** The entries of one kind, by the name that stands in the report: "ERROR", "WARNING", "ERROR_CALL_TREE", ...
      */
     [[nodiscard]] std::vector<ReportEntry> entries(std::string_view kind) const {

@@ -3,20 +3,21 @@
 
 #include <gtest/gtest.h>
 
-#include <cerrno>
 #include <charconv>
 #include <cstddef>
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
-#include <fstream>
 #include <iterator>
+#include <sstream>
 #include <string>
 #include <string_view>
+#include <type_traits>
 #include <utility>
 #include <vector>
 
 #include "quo_base/quorelxml_v2.h"
+#include "support/diagnostics.h"
 
 /** Header objects seen from outside: what their documentation promises, field by field, and the means to fill,
  * compare, print and damage them without knowing their class. */
@@ -28,30 +29,33 @@ std::string digits(Number value) {
     char buffer[40];
     return {buffer, std::to_chars(buffer, std::end(buffer), value).ptr};
 }
+inline std::string digits(char* text) { return text; }
+
+/** Calls `use` with each value of an element: a reference to a number, the place of a text. */
+template <typename Use>
+void for_each_value(const parElement& element, Use use) {
+    const auto all = [&](auto* values) {
+        for (std::ptrdiff_t i = 0; i < element.count; ++i) use(values[i]);
+    };
+    char* const text = static_cast<char*>(element.pointer);
+    switch (element.type) {
+        case parElement::typeDouble:
+            return all(static_cast<double*>(element.pointer));
+        case parElement::typeFloat:
+            return all(static_cast<float*>(element.pointer));
+        case parElement::typeInt:
+            return all(static_cast<std::int32_t*>(element.pointer));
+        case parElement::typeString:
+            return element.count == 1 ? all(&text) : all(static_cast<char* const*>(element.pointer));
+        case parElement::typeNone:
+            ADD_FAILURE() << element.name << " has no type";
+    }
+}
 
 /** The values of one element, each as text that tells any two apart. */
 inline std::vector<std::string> values_of(const parElement& element) {
     std::vector<std::string> values;
-    for (std::ptrdiff_t i = 0; i < element.count; ++i) {
-        switch (element.type) {
-            case parElement::typeDouble:
-                values.push_back(digits(static_cast<const double*>(element.pointer)[i]));
-                break;
-            case parElement::typeFloat:
-                values.push_back(digits(static_cast<const float*>(element.pointer)[i]));
-                break;
-            case parElement::typeInt:
-                values.push_back(std::to_string(static_cast<const std::int32_t*>(element.pointer)[i]));
-                break;
-            case parElement::typeString:
-                values.emplace_back(element.count == 1 ? static_cast<const char*>(element.pointer)
-                                                       : static_cast<char* const*>(element.pointer)[i]);
-                break;
-            case parElement::typeNone:
-                values.emplace_back("no type");
-                break;
-        }
-    }
+    for_each_value(element, [&](auto value) { values.push_back(digits(value)); });
     return values;
 }
 
@@ -60,30 +64,16 @@ inline std::vector<std::string> values_of(const parElement& element) {
 inline void fill_fields(const GeneralSAR_BaseXML& object, int seed = 1) {
     for (int i = 0; i < object.elementCount(); ++i) {
         const parElement& element = *object.element(i);
-        for (int k = 0; k < element.count; ++k) {
-            const int number = 803457 + 7919 * seed + 37 * i + k;
-            const std::string words = "Value " + std::to_string(number) + " <& more";
-            switch (element.type) {
-                case parElement::typeDouble:
-                    static_cast<double*>(element.pointer)[k] = number / 1000.0;
-                    break;
-                case parElement::typeFloat:
-                    static_cast<float*>(element.pointer)[k] = static_cast<float>(number) / 7.0F;
-                    break;
-                case parElement::typeInt:
-                    static_cast<std::int32_t*>(element.pointer)[k] = number;
-                    break;
-                case parElement::typeString: {
-                    char* to = element.count == 1 ? static_cast<char*>(element.pointer)
-                                                  : static_cast<char**>(element.pointer)[k];
-                    std::snprintf(to, element.room, "%s", words.c_str());
-                    break;
-                }
-                case parElement::typeNone:
-                    ADD_FAILURE() << element.name << " has no type";
-                    break;
-            }
-        }
+        int number = 803457 + 7919 * seed + 37 * i;
+        for_each_value(element, [&]<typename T>(T& value) {
+            if constexpr (std::is_pointer_v<T>)
+                std::snprintf(value, element.room, "%s", ("Value " + std::to_string(number) + " <& more").c_str());
+            else
+                value = static_cast<T>(number) / static_cast<T>(std::is_same_v<T, double>  ? 1000
+                                                                : std::is_same_v<T, float> ? 7
+                                                                                           : 1);
+            ++number;
+        });
     }
 }
 
@@ -102,26 +92,6 @@ inline std::vector<std::string> field_names(const GeneralSAR_BaseXML& object) {
     names.reserve(static_cast<std::size_t>(object.elementCount()));
     for (int i = 0; i < object.elementCount(); ++i) names.emplace_back(object.element(i)->name);
     return names;
-}
-
-/** The lines of a table of the test data, each cut at the separator into at most `columns` texts. */
-inline std::vector<std::vector<std::string>> read_table(const std::string& name, char separator = ',',
-                                                        std::size_t columns = 100) {
-    std::ifstream file{QUO_TEST_DATA + ("/" + name)};
-    EXPECT_TRUE(file) << name;
-    std::vector<std::vector<std::string>> rows;
-    for (std::string line; std::getline(file, line);) {
-        if (line.starts_with('#')) continue;
-        std::vector<std::string>& row = rows.emplace_back();
-        for (auto end = line.find(separator); end != line.npos && row.size() + 1 < columns;
-             end = line.find(separator)) {
-            row.push_back(line.substr(0, end));
-            line.erase(0, end + 1);
-        }
-        row.push_back(line);
-    }
-    errno = 0;
-    return rows;
 }
 
 /** What is promised of a field. */
@@ -161,33 +131,24 @@ inline std::string described(const parElement& element) {
     return text + "," + described(element.rule);
 }
 
-/** One element of a header file as written, tags included; empty when there is none. */
-inline std::string element_text(const std::string& file, const std::string& name) {
-    const auto start = file.find("<" + name + ">"), end = file.find("</" + name + ">");
-    return start == file.npos || end == file.npos ? "" : file.substr(start, end + name.size() + 3 - start);
-}
-
 /** A header file without one element. */
 inline std::string without_element(std::string file, const std::string& name) {
-    const std::string element = element_text(file, name);
-    EXPECT_NE(element, "") << name;
-    return file.erase(file.find(element), element.size());
+    const auto start = file.find("<" + name + ">"), end = file.find("</" + name + ">");
+    EXPECT_TRUE(start != file.npos && end != file.npos) << name;
+    return file.erase(start, end + name.size() + 3 - start);
 }
 
-/** Names of an element's children, in the order of the file. */
+/** Names of the children of an element, which stand in lines of their own two blanks further in. */
 inline std::vector<std::string> child_names(const std::string& file, const std::string& parent) {
-    const std::string inside = element_text(file, parent);
     std::vector<std::string> names;
-    int depth = 0;
-    for (auto tag = inside.find('<'); tag != inside.npos; tag = inside.find('<', tag + 1)) {
-        const auto end = inside.find('>', tag);
-        if (inside[tag + 1] == '/') {
-            --depth;
-            continue;
-        }
-        if (depth == 1) names.push_back(inside.substr(tag + 1, inside.find_first_of(" />", tag + 1) - tag - 1));
-        if (inside[end - 1] != '/') ++depth;
+    std::istringstream lines{file};
+    std::string line;
+    while (std::getline(lines, line) && line.find("<" + parent + ">") == line.npos) {
     }
+    const std::string inside = line.substr(0, line.find('<')) + "  <", end = "</" + parent;
+    while (std::getline(lines, line) && line.find(end) == line.npos)
+        if (line.starts_with(inside) && line[inside.size()] != '/')
+            names.push_back(line.substr(inside.size(), line.find_first_of(" />", inside.size()) - inside.size()));
     return names;
 }
 

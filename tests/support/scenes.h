@@ -2,16 +2,15 @@
 #define QUO_TESTS_SUPPORT_SCENES_H
 
 #include <cmath>
-#include <fstream>
 #include <limits>
 #include <ostream>
-#include <sstream>
 #include <stdexcept>
 #include <string>
 #include <vector>
 
 #include "quo_base/generalSARorbit.h"
 #include "quo_base/quorelxml_v2.h"
+#include "support/diagnostics.h"
 
 namespace test {
 
@@ -55,21 +54,15 @@ inline void load_orbit(const Scene& scene, GeneralSAROrbit& orbit) {
 
 /** The scene's tie points, pure geometry. */
 inline std::vector<TiePoint> load_tie_points(const Scene& scene) {
-    std::ifstream file{scene.path("_tie_points.csv")};
     std::vector<TiePoint> points;
-    for (std::string line; std::getline(file, line);) {
-        if (line.empty() || line[0] == '#' || line[0] == 'a') continue;
-        std::istringstream cells{line};
-        double values[7];
-        std::string cell;
-        for (double& value : values) {
-            const bool found = static_cast<bool>(std::getline(cells, cell, ',')) && !cell.empty();
-            value = found ? std::stod(cell) : std::numeric_limits<double>::quiet_NaN();
-        }
-        points.push_back({values[0], values[1], values[2], values[3], values[4], values[5], values[6]});
+    for (const auto& row : read_table("scenes/" + std::string{scene.file} + "_tie_points.csv")) {
+        if (row[0].empty() || row[0][0] == 'a') continue;
+        const auto value = [&](std::size_t i) {
+            return i < row.size() && !row[i].empty() ? std::stod(row[i]) : std::nan("");
+        };
+        points.push_back({value(0), value(1), value(2), value(3), value(4), value(5), value(6)});
     }
     if (points.empty()) throw std::runtime_error{"no tie points of " + std::string{scene.file}};
-    errno = 0;
     return points;
 }
 
