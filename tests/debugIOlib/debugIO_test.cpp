@@ -46,22 +46,13 @@ TEST(WriteDebug, RefusesWithItsStatusAndAnEntry) {
     }
 }
 
-TEST(Waitbar, SpeaksItsLinesAndCutsALongTitle) {
+// A stream that nobody can write to used to leave its error number to the next tracked function.
+TEST(Waitbar, SpeaksItsLinesCutsALongTitleAndLeavesNoErrorBehind) {
     test::CapturedStderr captured;
     EXPECT_EQ(waitbar_open("Focusing 100%s"), 0);
     for (const float share : {0.5F, -1.0F / 3.0F, std::numeric_limits<float>::max()})
         EXPECT_EQ(waitbar_update(share), 0);
-    EXPECT_EQ(waitbar_close(), 0);
-    EXPECT_EQ(waitbar_open(std::string(5000, 'x').c_str()), 0);
-    EXPECT_EQ(captured.text(),
-              "USE_WAITBAR\nSET_TITLE: Focusing 100%s\nSET_WAITBAR: 0.500000 \nSET_WAITBAR: -0.333333 \n"
-              "SET_WAITBAR: 340282346638528859811704183484516925440.000000 \nCLOSE_WAITBAR\n"
-              "USE_WAITBAR\nSET_TITLE: " +
-                  std::string(499, 'x') + "\n");
-}
-
-// A stream that nobody can write to used to leave its error number to the next tracked function.
-TEST(Waitbar, LeavesNoErrorBehindWhereNobodyListens) {
+    EXPECT_EQ(waitbar_close() + waitbar_open(std::string(5000, 'x').c_str()), 0);
     const int kept = dup(STDERR_FILENO);
     close(STDERR_FILENO);
     errno = 0;
@@ -70,6 +61,11 @@ TEST(Waitbar, LeavesNoErrorBehindWhereNobodyListens) {
     dup2(kept, STDERR_FILENO);
     close(kept);
     std::clearerr(stderr);
+    EXPECT_EQ(captured.text(),
+              "USE_WAITBAR\nSET_TITLE: Focusing 100%s\nSET_WAITBAR: 0.500000 \nSET_WAITBAR: -0.333333 \n"
+              "SET_WAITBAR: 340282346638528859811704183484516925440.000000 \nCLOSE_WAITBAR\n"
+              "USE_WAITBAR\nSET_TITLE: " +
+                  std::string(499, 'x') + "\n");
 }
 
 }  // namespace

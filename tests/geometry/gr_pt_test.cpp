@@ -51,12 +51,9 @@ void expect_solution(const Request& look, const Vec3& P) {
 
 /** Where a ray from a satellite meets the WGS84 ellipsoid first, as the distance; NaN where it passes by. */
 double ray_range(const Vec3& from, const Vec3& direction) {
-    const Vec3 weights{1.0 / (kSemiMajor * kSemiMajor), 1.0 / (kSemiMajor * kSemiMajor),
-                       1.0 / (kSemiMinor * kSemiMinor)};
-    const auto product = [&](const Vec3& p, const Vec3& q) {
-        return dot({weights[0] * p[0], weights[1] * p[1], weights[2] * p[2]}, q);
-    };
-    const double A = product(direction, direction), B = product(from, direction), C = product(from, from) - 1.0;
+    const Vec3 gradient = test::ellipsoid_gradient(direction);
+    const double A = dot(gradient, direction), B = dot(gradient, from);
+    const double C = dot(test::ellipsoid_gradient(from), from) - 1.0;
     return C / (-B + std::sqrt(B * B - A * C));
 }
 

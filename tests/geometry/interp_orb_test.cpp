@@ -56,18 +56,12 @@ struct Pass {
     double at_vectors_m, between_m;
 };
 
+// Of the last two, the one polynomial through all vectors would miss them by metres once it is evaluated.
 TEST(OrbInterp, PassesThroughTheVectorsAndFollowsTheOrbitBetween) {
     const test::CircularOrbit orbit{77.3, 12.8, -12.7};
-    const Pass kPasses[] = {
-        {5, -13.7, 10.0, true, 4e-9, 3e-5},
-        {9, 7.3, 60.0, false, 4e-9, 1e-5},
-        {17, 0.0, 10.0, true, 4e-9, 3e-4},
-        {31, 0.0, 10.0, false, 2e-8, 1e-6},
-        // Here the one polynomial through all vectors would miss them by metres once it is evaluated.
-        {31, 0.0, 60.0, true, 2e-6, 1e-4},
-        {97, 0.0, 10.0, true, 2e-6, 1e-4},
-    };
-    for (const Pass& pass : kPasses) {
+    for (const Pass& pass : {Pass{5, -13.7, 10.0, true, 4e-9, 3e-5}, Pass{9, 7.3, 60.0, false, 4e-9, 1e-5},
+                             Pass{17, 0.0, 10.0, true, 4e-9, 3e-4}, Pass{31, 0.0, 10.0, false, 2e-8, 1e-6},
+                             Pass{31, 0.0, 60.0, true, 2e-6, 1e-4}, Pass{97, 0.0, 10.0, true, 2e-6, 1e-4}}) {
         SCOPED_TRACE(testing::Message() << pass.n << " vectors " << pass.dt << " s apart");
         auto positions = sampled(pass.n, 0.0, pass.dt, [&](double t) { return orbit.earth_fixed(t).position; });
         if (pass.decimals)

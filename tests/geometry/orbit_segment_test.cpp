@@ -82,10 +82,8 @@ TEST(GrPtLatLon, GivesThePointOfGrPtWithItsAnglesAndTheSlopeOfItsDoppler) {
     EXPECT_EQ(sample(segment(), kReference + 17.3, 80345.7, 0.0, 1.0, 0.0, out), 10);
     EXPECT_EQ(sample(segment(), std::nan(""), 848730.1, 0.0, 1.0, 0.0, out), 1);
     EXPECT_EQ(out.look_deg, 17.3);
-    const auto errors = report.entries("ERROR"), tree = report.entries("ERROR_CALL_TREE");
-    ASSERT_EQ(errors.size() + tree.size(), 4U);
-    EXPECT_EQ(errors[0].function, "gr_pt0");
-    EXPECT_EQ(tree[0].function, "gr_pt_lat_lon");
+    ASSERT_EQ(report.entries().size(), 4U);
+    EXPECT_EQ(report.entries()[0].function + report.entries()[1].function, "gr_pt0gr_pt_lat_lon");
 }
 
 struct Seen {
@@ -106,11 +104,10 @@ TEST(InvGrptOpt, ClosesTheRoundTrip) {
         for (const double t : {0.917, 7.9, 20.0, 31.3, 39.083})
             for (const double fd : {0.0, 1217.6, -9876.5, 90123.4, -90123.4})
                 for (const double side : {+1.0, -1.0}) {
-                    SCOPED_TRACE(testing::Message() << "height " << height << " t " << t << " fd " << fd);
                     const Vec3 P = ground(orbit, t, range, fd, side);
                     const Seen image = seen(orbit, P, fd);
                     ASSERT_EQ(image.status, 0);
-                    EXPECT_NEAR(image.t, t, 1e-9);
+                    EXPECT_NEAR(image.t, t, 1e-9) << height << ' ' << fd;
                     EXPECT_NEAR(image.tau * kLightSpeed / 2.0, range, 1e-5);
                 }
     }
