@@ -270,9 +270,9 @@ TEST(RotationMatrix, TurnsTheVelocityAlongTheFirstAxis) {
         ASSERT_EQ(GeneralSAROrbit::computeRotationMatrix(v.v, R, &speed), 0);
         EXPECT_DOUBLE_EQ(speed, v[0] < 0.0 ? -test::norm(v) : test::norm(v));
         // The angles as they are defined.
-        const double yaw = std::atan(-v[1] / v[0]);
+        const double yaw = std::atan(-v[1] / v[0]), c = std::cos(yaw), s = std::sin(yaw);
         const double pitch = std::atan(-v[2] / std::copysign(std::hypot(v[0], v[1]), v[0]));
-        const double c = std::cos(yaw), s = std::sin(yaw), cp = std::cos(pitch), sp = std::sin(pitch);
+        const double cp = std::cos(pitch), sp = std::sin(pitch);
         const double rows[9] = {c * cp, s, sp * c, -s * cp, c, -s * sp, -sp, 0.0, cp};
         for (int i = 0; i < 9; ++i) EXPECT_NEAR(R[i], rows[i], 1e-15) << i;
     }
