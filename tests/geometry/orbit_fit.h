@@ -3,7 +3,6 @@
 
 #include <gtest/gtest.h>
 
-#include <cstddef>
 #include <vector>
 
 #include "quo_base/interp_orb.h"

@@ -1,6 +1,5 @@
 #include "sarutillib/ground/file_io.h"
 
-#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <grp.h>
 #include <gtest/gtest.h>

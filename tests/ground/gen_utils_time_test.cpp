@@ -8,6 +8,7 @@
 #include <random>
 #include <sstream>
 #include <string>
+#include <utility>
 
 #include "quo_base/gen_utils.h"
 #include "sarutillib/ground/gen_utils_dates.h"

@@ -54,6 +54,7 @@ constexpr Journey kJourneys[] = {
     {"DescendingVxNegative", 693e3, 37.1, -143.9, 192.4, 0.7, 23, 0.0, 2.0, true},
     {"EastwardsVxNearZero", 693e3, 0.0, 0.0, 90.0, 9.7, 17, 0.0, 2.0, true},
     {"OverThePoleSquinted", 693e3, 48.3, 12.8, -1.7, 60.0, 17, 0.0, 4.0, true},
+    {"ThreeQuartersOfARevolution", 693e3, 41.3, 12.8, -12.7, 60.0, 77, 0.0, 0.0, true},
     {"ManyVectorsSquintedFar", 693e3, 41.3, 12.8, -12.7, 10.0, 100, 15.0, 45.0, true},
     {"TwoRevolutions", 693e3, 41.3, 12.8, -12.7, 10.0, 1200, 0.0, 4.0, false},
     {"NavigationSatellite", 20200e3, 10.0, 12.8, 40.0, 60.0, 360, 0.0, 0.0, false},

@@ -4,7 +4,7 @@
 #include <cstdint>
 #include <limits>
 #include <string>
-#include <utility>
+#include <tuple>
 #include <vector>
 
 #include "orbit/made_orbits.h"
