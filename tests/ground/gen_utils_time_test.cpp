@@ -67,6 +67,7 @@ TEST(Time, IsTheSameInItsThreeNotations) {
         EXPECT_EQ(found.substr(0, 20) + found[27], row.text.substr(0, 20) + '#');
         EXPECT_NEAR(std::stod(found.substr(18, 9)), std::stod(row.text.substr(18)), 1.1e-6);
     }
+    EXPECT_EQ(date_text(0.0), "01-JAN-1985 00:00:00.000000");
     EXPECT_EQ(date_text(86399.9999999), "01-JAN-1985 23:59:59.999999");
     EXPECT_EQ(date_text(17.25 + 0.0009765625), "01-JAN-1985 00:00:17.250976");
     EXPECT_EQ(record_text(kYear2000 + 17.25 + 0.0009765625), "0 17 250976");

@@ -75,8 +75,10 @@ TEST(Allocators, RefuseWhatCannotBeWhileTrackingAndLeaveNothing) {
     EXPECT_FALSE(f3tensor(1, INT_MAX, 1, INT_MAX, 1, INT_MAX) || f3tensor(1, 2, 1, 0, 1, 2));
     EXPECT_EQ(convert_matrix(nullptr, 1, 0, 3, 1), nullptr);
     test::fail_every_allocation([] {
-        float*** t = f3tensor(1, 2, 1, 3, 1, 4);
+        double** m = dmatrix(1, 3, 1, 4);
+        float*** t = m ? f3tensor(1, 2, 1, 3, 1, 4) : nullptr;
         free_f3tensor(t, 1, 2, 1, 3, 1, 4);
+        free_dmatrix(m, 1, 3, 1, 4);
         return t ? 0 : 7;
     });
 }

@@ -181,6 +181,16 @@ TEST_F(PreciseOrbit, IsMetBetweenItsVectorsAndTheEstimateKnowsHowWell) {
     }
 }
 
+// A vector that stands 1 us beside its place is 7.6 mm off there: the positions contradict each other.
+TEST_F(PreciseOrbit, TellsTheErrorOfVectorsBesideTheirPlaces) {
+    GeneralSAROrbit orbit;
+    give(orbit, 6, first(17));
+    for (int i = 0; i < 51; ++i) orbit.pSV_m[i] += (i / 3 % 2 ? 1e-6 : -1e-6) * orbit.vSV_mOs[i];
+    ASSERT_EQ(orbit.SVResample(10.0), 0);
+    EXPECT_GT(error_m(orbit), 7e-3);
+    EXPECT_GT(orbit.orbitFitError(), error_m(orbit) / 4.0);
+}
+
 // Vectors in a row as they are found in files: a missing one shifted all that follow, by 41 km and without a word.
 TEST_F(PreciseOrbit, WithAnUnevenListIsNamedAndNotResampled) {
     struct Row {
