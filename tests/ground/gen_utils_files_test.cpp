@@ -41,10 +41,10 @@ TEST(Seek, CountsFromStartPositionAndEndAndRefusesWhatLeadsNowhere) {
         off_t place;
         std::string text;  // found there
     } rows[] = {{kFar, 0, kFar, "mark"}, {5, 1, kFar + 9, "tail"}, {-kFar - 13, 2, 0, "first"}, {-3, 1, 2, "rst"}};
-    for (const auto& row : rows) {
-        EXPECT_EQ(myfseek64_msc(stream.get(), row.offset, row.whence), 0);
-        EXPECT_EQ(lseek(fileno(stream.get()), 0, SEEK_CUR), row.place);
-        EXPECT_EQ(read(row.text.size()), row.text);
+    for (const auto& [offset, whence, place, text] : rows) {
+        EXPECT_EQ(myfseek64_msc(stream.get(), offset, whence), 0);
+        EXPECT_EQ(lseek(fileno(stream.get()), 0, SEEK_CUR), place);
+        EXPECT_EQ(read(text.size()), text);
     }
     EXPECT_EQ(myfseek64_msc(stream.get(), 0, 0), 0);
     std::fputs("FIRST", stream.get());

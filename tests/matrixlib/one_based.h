@@ -17,6 +17,8 @@ public:
         for (std::ptrdiff_t i = 0; i < rows; ++i) rows_.push_back(flat_.data() + i * columns - 1);
     }
     OneBased(int rows, int columns) : OneBased{{}, rows, columns} {}
+    OneBased(const OneBased&) = delete;
+    OneBased& operator=(const OneBased&) = delete;
 
     double** get() { return rows_.data() - 1; }
     [[nodiscard]] const Flat& flat() const { return flat_; }
