@@ -141,12 +141,14 @@ TEST_F(AtomicFileTest, RefusesWhatIsNoFileToReplace) {
 // Refused, the change was lost although the file itself could be written.
 TEST_F(AtomicFileTest, WritesInPlaceWhereNothingCanBeReplaced) {
     chmod(name_.c_str(), 0666);
-    chmod(folder_.path().c_str(), 01777);
-    for (const char* content : {"longer than the old one", "x"}) {
-        const test::OrdinaryUser user;
-        AtomicFile file{name_.c_str()};
-        EXPECT_TRUE(file.write(content) && file.commit() && file.in_place());
-        expect_header(content);
+    for (const mode_t closed : {0555, 01777}) {  // nothing may be made, or replaced
+        chmod(folder_.path().c_str(), closed);
+        for (const char* content : {"longer than the old one", "x"}) {
+            const test::OrdinaryUser user;
+            AtomicFile file{name_.c_str()};
+            EXPECT_TRUE(file.write(content) && file.commit() && file.in_place());
+            expect_header(content);
+        }
     }
     AtomicFile null{"/dev/null"};
     EXPECT_TRUE(null.write("swallowed") && null.commit() && null.in_place());
@@ -172,12 +174,30 @@ TEST_F(AtomicFileTest, LeavesAFileToItsGroup) {
 }
 
 // The next save of a file sweeps what killed processes left, but never a living one's.
-TEST_F(AtomicFileTest, LeavesALivingProcessItsTemporaryFile) {
+TEST_F(AtomicFileTest, SweepsWhatKilledProcessesLeft) {
+    const pid_t child = fork();
+    if (child == 0) _exit((new AtomicFile{name_.c_str()})->write("half") ? 0 : 1);
+    waitpid(child, nullptr, 0);
+    expect_header("old", 1);
     AtomicFile living{name_.c_str()};
     EXPECT_TRUE(living.write("first") && replace(name_, "second"));
     expect_header("second", 1);
     EXPECT_TRUE(living.commit());
     expect_header("first");
+}
+
+// A raster is of no use with the description of another.
+TEST_F(AtomicFileTest, ReplacesBothFilesOfAPairOrNone) {
+    const std::string other = folder_.file("other");
+    for (const bool fails : {true, false}) {
+        fs::remove_all(other);
+        AtomicFile first{name_.c_str()}, second{other.c_str()};
+        EXPECT_TRUE(first.write("new") && second.write("its description"));
+        if (fails) fs::create_directory(other);
+        EXPECT_EQ(commit_pair(first, second), !fails);
+        EXPECT_EQ(fs::is_directory(other), fails);
+        expect_header(fails ? "old" : "new", 1);
+    }
 }
 
 }  // namespace

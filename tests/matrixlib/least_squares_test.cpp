@@ -167,6 +167,17 @@ TEST(CertifiedData, IsReproducedToTheDigitsOfEachMethodWithWhateverMemory) {
     }
 }
 
+TEST(Polfit, RunsThroughAnExactPolynomialOfAnyDegree) {
+    const Values exact{1.3, 0.6, -0.1, -0.8, -1.5, -2.2, -2.9, -3.6};
+    for (int degree = 0; degree <= 7; ++degree) {
+        Values x, y, c(8);
+        for (int k = 0; k < 17; ++k) x.push_back(-0.9 + 0.11 * k);
+        for (const double value : x) y.push_back(polval(exact.data(), degree, value));
+        ASSERT_EQ(polfit(x.data(), y.data(), 17, c.data(), degree), 0);
+        for (std::size_t i = 0; i < 8; ++i) EXPECT_NEAR(c[i], int(i) > degree ? 0.0 : exact[i], 1e-9) << degree;
+    }
+}
+
 TEST(Polfit, IgnoresASingularSystemAndRefusesNoPoints) {
     const test::Report report;
     const test::CapturedStderr silent;

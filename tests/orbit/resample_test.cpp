@@ -282,6 +282,11 @@ TEST(SVCheck, FindsOneWrongVector) {
             EXPECT_NE(texts(findings).find("state vector " + std::to_string(index) + ":"), std::string::npos);
         }
     }
+    test::Flight flight{{803457.3, 9.7, 13}};  // the first has no predecessor: its successor is the duplicate
+    std::copy_n(flight.orbit.pSV_m + 3, 3, flight.orbit.pSV_m);
+    flight.orbit.pSV_m[0] += 3.0;
+    EXPECT_EQ(check(flight.orbit).back().problem, SVFinding::kDuplicate);
+    EXPECT_EQ(check(flight.orbit).back().index, 1);
 }
 
 TEST(SVCheck, FindsWhatIsWrongWithTheList) {
