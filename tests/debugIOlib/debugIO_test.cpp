@@ -1,6 +1,5 @@
 #include "quo_base/debugIO.h"
 
-#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <unistd.h>
 
@@ -30,54 +29,43 @@ TEST(WriteDebug, WritesThreeWordsAndTheElements) {
 }
 
 TEST(WriteDebug, RefusesWithItsStatusAndAnEntry) {
-    const struct {
+    struct Row {
         const char* file;
         int type, first, status;
         const char* message;  // behind what the system says; empty for any
-    } rows[] = {{"/missing/dump.bin", 1, 2, 9, "File not opened!"},
-                {"/dev/full", 1, 2, 5, "File writing failed!"},
-                {"/dev/null", 6, 2, 1, ""},
-                {"/dev/null", -1, 2, 1, ""},
-                {"/dev/null", 1, -2, 1, ""}};
-    const double data[4] = {1, 2, 3, 4};
-    for (const auto& row : rows) {
+    };
+    for (const Row& row :
+         {Row{"/missing/dump.bin", 1, 2, 9, "File not opened!"}, Row{"/dev/full", 1, 2, 5, "File writing failed!"},
+          Row{"/dev/null", 6, 2, 1, ""}, Row{"/dev/null", -1, 2, 1, ""}, Row{"/dev/null", 1, -2, 1, ""}}) {
         const test::Report report;
         const test::CapturedStderr silent;
-        EXPECT_EQ(write_debug(row.file, data, row.type, row.first, 2), row.status) << row.file;
-        const auto entries = report.entries("ERROR");
-        ASSERT_FALSE(entries.empty());
-        EXPECT_EQ(entries[0].function, "write_debug()");
-        if (*row.message) {
-            EXPECT_EQ(entries.back().message, row.message);
-        }
+        EXPECT_EQ(write_debug(row.file, "01234567890123456789012345678901", row.type, row.first, 2), row.status);
+        ASSERT_FALSE(report.entries("ERROR").empty());
+        EXPECT_EQ(report.entries("ERROR")[0].function, "write_debug()");
+        EXPECT_TRUE(!*row.message || report.entries("ERROR").back().message == row.message) << row.file;
     }
 }
 
-TEST(Waitbar, SpeaksItsLinesAndCutsALongTitle) {
+// A stream that nobody can write to used to leave its error number to the next tracked function.
+TEST(Waitbar, SpeaksItsLinesCutsALongTitleAndLeavesNoErrorBehind) {
     test::CapturedStderr captured;
     EXPECT_EQ(waitbar_open("Focusing 100%s"), 0);
     for (const float share : {0.5F, -1.0F / 3.0F, std::numeric_limits<float>::max()})
         EXPECT_EQ(waitbar_update(share), 0);
-    EXPECT_EQ(waitbar_close(), 0);
-    EXPECT_EQ(waitbar_open(std::string(5000, 'x').c_str()), 0);
-    EXPECT_EQ(captured.text(),
-              "USE_WAITBAR\nSET_TITLE: Focusing 100%s\nSET_WAITBAR: 0.500000 \nSET_WAITBAR: -0.333333 \n"
-              "SET_WAITBAR: 340282346638528859811704183484516925440.000000 \nCLOSE_WAITBAR\n"
-              "USE_WAITBAR\nSET_TITLE: " +
-                  std::string(499, 'x') + "\n");
-}
-
-// A stream that nobody can write to used to leave its error number to the next tracked function.
-TEST(Waitbar, LeavesNoErrorBehindWhereNobodyListens) {
-    const int kept = dup(STDERR_FILENO), unwritable = open("/dev/null", O_RDONLY);
-    dup2(unwritable, STDERR_FILENO);
+    EXPECT_EQ(waitbar_close() + waitbar_open(std::string(5000, 'x').c_str()), 0);
+    const int kept = dup(STDERR_FILENO);
+    close(STDERR_FILENO);
     errno = 0;
     EXPECT_EQ(waitbar_open("Focusing") + waitbar_update(0.5F) + waitbar_close(), 0);
     EXPECT_EQ(errno, 0);
     dup2(kept, STDERR_FILENO);
     close(kept);
-    close(unwritable);
     std::clearerr(stderr);
+    EXPECT_EQ(captured.text(),
+              "USE_WAITBAR\nSET_TITLE: Focusing 100%s\nSET_WAITBAR: 0.500000 \nSET_WAITBAR: -0.333333 \n"
+              "SET_WAITBAR: 340282346638528859811704183484516925440.000000 \nCLOSE_WAITBAR\n"
+              "USE_WAITBAR\nSET_TITLE: " +
+                  std::string(499, 'x') + "\n");
 }
 
 }  // namespace

@@ -98,23 +98,6 @@ struct Product {
             EXPECT_TRUE(operation.fine != fine || operation.run(orbit, &roi, &dc, derived) == 0) << operation.name;
         }
     }
-    /** The ground points of steps from the start to a share of the range times, as the sum of their chords. */
-    double ground_range(double azimuth_s, double share, int steps) {
-        test::Vec3 before{}, point{};
-        double sum_m = 0.0;
-        for (int i = 0; i <= steps; ++i) {
-            const double range_s = range(share * i / std::max(steps, 1));
-            EXPECT_EQ(orbit.sat2earth(azimuth_s, range_s, doppler(azimuth_s, range_s), point.v), 0);
-            if (i > 0) sum_m += norm(point - before);
-            before = point;
-        }
-        return sum_m;
-    }
-    /** A place, its ground range in so many chords, and the geometry there. */
-    Place place(double along, double across, int steps) {
-        const double azimuth_s = azimuth(along), range_s = range(across);
-        return {azimuth_s, range_s, doppler(azimuth_s, range_s), ground_range(azimuth_s, across, steps)};
-    }
     std::array<double, kQuantities> truth(const Place& at) {
         GrPtGeometry g{};
         EXPECT_EQ(orbit.SVGetGeometry(at.azimuth_s, at.range_s, at.doppler_hz, &g), 0);
@@ -123,102 +106,53 @@ struct Product {
     }
 };
 
-/** A real scene, and how far the polynomials may stay from the geometry: parabolas at the middle azimuth time,
- * then the forms in both times. */
-struct Region {
-    const char* name;
-    std::size_t scene;
-    double parabolas[kQuantities], grids[kQuantities];
-};
-void PrintTo(const Region& region, std::ostream* out) { *out << region.name; }
-const Region kRegions[] = {
-    {"SatelliteSubSwath", 0, {0.04, 0.008, 0.008, 80.0, 12.0}, {0.04, 0.0006, 0.0006, 5.0, 0.7}},
-    {"SatelliteSwath", 1, {0.8, 0.1, 0.1, 900.0, 200.0}, {0.8, 0.005, 0.005, 40.0, 1.5}},
-    {"Aircraft", 2, {0.0025, 0.13, 0.13, 27.0, 1.8}, {0.0025, 0.009, 0.009, 2.0, 0.007}},
-};
-
 // Accelerations, and with them the FM rate, depend a little on the run of state vectors in use, which hangs on the
 // calls before.
 constexpr double kRateDefect = 1e-8;
 
-class DerivedPolynomials : public testing::TestWithParam<Region> {
+class DerivedPolynomials : public testing::TestWithParam<test::Scene> {
 protected:
-    DerivedPolynomials() : product_{test::kScenes[GetParam().scene]} {}
-
-    /** Largest differences at places between the samples, at azimuth times `from` to `to` of the region. */
-    std::array<double, kQuantities> residuals(const Derived& derived, double from, double to) {
-        std::array<double, kQuantities> largest{};
-        for (const double along : {from, from + 0.31 * (to - from), from + 0.77 * (to - from), to}) {
-            for (int i = 0; i <= 16; ++i) {
-                const Place place = product_.place(along, i / 16.0, 400);
-                const auto fitted = derived.at(place), direct = product_.truth(place);
-                for (int q = 0; q < kQuantities; ++q)
-                    largest[q] = std::max(largest[q], std::abs(fitted[q] - direct[q]));
-            }
-        }
-        return largest;
-    }
-    static void expect_below(const std::array<double, kQuantities>& largest, const double (&bounds)[kQuantities]) {
-        for (int q = 0; q < kQuantities; ++q) {
-            EXPECT_LT(largest[q], bounds[q]) << kUnits[q];
-            EXPECT_GT(largest[q], 1e-4 * bounds[q]) << kUnits[q];  // else nothing was compared
-        }
-    }
     /** How far the residuals at the very samples are from orthogonal to the terms of a fit, which a least-squares
      * fit makes them: the largest sum of residuals times a term, relative to that of the values. */
-    double defect(const Derived& derived, int quantity, int ranges, int azimuths) {
+    double defect(const Derived& derived, std::size_t quantity, int ranges, int azimuths) {
         std::array<double, 7> sums{}, scales{};
+        const std::size_t terms_count = azimuths > 1 ? 7 : 3;
         for (int j = 0; j < azimuths; ++j) {
             const double v = azimuths > 1 ? j / (azimuths - 1.0) : 0.5;
-            double ground_m = 0.0;
-            test::Vec3 before{};
+            test::Vec3 before{}, point{};
+            Place place{product_.azimuth(v), 0.0, 0.0, 0.0};
             for (int i = 0; i < ranges; ++i) {
                 const double u = i / (ranges - 1.0);
-                Place place = product_.place(v, u, 0);
-                test::Vec3 point{};
+                place.range_s = product_.range(u);
+                place.doppler_hz = product_.doppler(place.azimuth_s, place.range_s);
                 EXPECT_EQ(product_.orbit.sat2earth(place.azimuth_s, place.range_s, place.doppler_hz, point.v), 0);
-                if (i > 0) ground_m += norm(point - before);
+                if (i > 0) place.ground_m += norm(point - before);  // the sum of the chords
                 before = point;
-                place.ground_m = ground_m;
-                const auto q = static_cast<std::size_t>(quantity);
-                const double direct = product_.truth(place)[q], rest = derived.at(place)[q] - direct;
+                const double direct = product_.truth(place)[quantity], rest = derived.at(place)[quantity] - direct;
                 // A parabola over ground range is orthogonal to powers of the ground range.
-                const double w = quantity == kSlant ? ground_m / 1e5 : u, more = azimuths > 1 ? 1.0 : 0.0;
-                const double terms[] = {
-                    1.0, w, w * w, more * v, more * w * v, more * w * w * w, more * w * w * w * w};
-                for (std::size_t k = 0; k < 7; ++k) {
+                const double w = quantity == kSlant ? place.ground_m / 1e5 : u;
+                const double terms[] = {1.0, w, w * w, v, w * v, w * w * w, w * w * w * w};
+                for (std::size_t k = 0; k < terms_count; ++k) {
                     sums[k] += rest * terms[k];
                     scales[k] += std::abs(direct * terms[k]);
                 }
             }
         }
         double largest = 0.0;
-        for (std::size_t k = 0; k < (azimuths > 1 ? 7U : 3U); ++k)
-            largest = std::max(largest, std::abs(sums[k]) / scales[k]);
+        for (std::size_t k = 0; k < terms_count; ++k) largest = std::max(largest, std::abs(sums[k]) / scales[k]);
         return largest;
     }
-    Product product_;
+    Product product_{GetParam()};
     polyDC& dc_ = product_.dc;
     const ROI_Obj& roi_ = product_.roi;
 };
-INSTANTIATE_TEST_SUITE_P(Scenes, DerivedPolynomials, testing::ValuesIn(kRegions),
+INSTANTIATE_TEST_SUITE_P(Scenes, DerivedPolynomials, testing::ValuesIn(test::kScenes),
                          [](const auto& row) { return row.param.name; });
-
-TEST_P(DerivedPolynomials, StayWithinTheirBounds) {
-    Derived parabolas, grids;
-    product_.derive(parabolas, false);
-    product_.derive(grids, true);
-    expect_below(residuals(parabolas, 0.5, 0.5), GetParam().parabolas);
-    // The rate of the second form has no azimuth term either.
-    auto largest = residuals(grids, 0.0, 1.0);
-    largest[kRate] = residuals(grids, 0.5, 0.5)[kRate];
-    expect_below(largest, GetParam().grids);
-}
 
 // What defines the fits, with other sums than theirs. A step too many or too few, a wrong Doppler or azimuth time,
 // lost digits or a mixed-up coefficient breaks it.
 TEST_P(DerivedPolynomials, LeaveResidualsOrthogonalToTheirTerms) {
-    const double doppler_hz = test::kScenes[GetParam().scene].doppler_hz;
+    const double doppler_hz = GetParam().doppler_hz;
     const double slopes[7] = {0.3 * doppler_hz, 0.4 * doppler_hz / roi_.FastTimeLength,
                               0.01 * doppler_hz / roi_.SlowTimeLength};
     std::ranges::copy(slopes, dc_.pol);
@@ -226,10 +160,11 @@ TEST_P(DerivedPolynomials, LeaveResidualsOrthogonalToTheirTerms) {
     Derived parabolas, grids;
     product_.derive(parabolas, false);
     product_.derive(grids, true);
-    for (const int q : {kRate, kIncidence, kLook, kGround, kSlant})
+    for (const std::size_t q : {kRate, kIncidence, kLook, kGround, kSlant})
         EXPECT_LT(defect(parabolas, q, 10, 1), q == kRate ? kRateDefect : 1e-10) << kUnits[q];
     EXPECT_LT(defect(grids, kRate, 50, 1), kRateDefect);
-    for (const int q : {kIncidence, kLook, kGround}) EXPECT_LT(defect(grids, q, 100, 50), 1e-10) << kUnits[q];
+    for (const std::size_t q : {kIncidence, kLook, kGround})
+        EXPECT_LT(defect(grids, q, 100, 50), 1e-10) << kUnits[q];
 
     for (std::size_t q = 0; q < kQuantities; ++q) {  // they stand around the region
         const poly &parabola = *parabolas.all()[q], &grid = *grids.all()[q];
@@ -308,25 +243,26 @@ INSTANTIATE_TEST_SUITE_P(All, DerivedFailures, testing::ValuesIn(kOperations),
                          [](const auto& row) { return row.param.name; });
 
 TEST_P(DerivedFailures, LeaveTheOutputsAndSaySo) {
-    constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
-    const std::pair<int, void (*)(ROI_Obj&, polyDC&)> defects[] = {
-        {1, [](auto& roi, auto&) { roi.FastStartTime = kNaN; }},
-        {1, [](auto& roi, auto&) { roi.SlowStartTime = kNaN; }},
-        {10, [](auto& roi, auto&) { roi.FastTimeLength = 0.1; }},  // beyond the horizon
-        {1, [](auto&, auto& dc) { dc.pol[0] = kNaN; }},
-        {10, [](auto&, auto& dc) { dc.pol[0] = 1e6; }},
+    struct Defect {
+        int status;
+        void (*spoil)(ROI_Obj&, polyDC&);
+        bool in_both_times = false;  // of the forms in both times only
     };
-    for (const auto& [status, spoil] : defects) {
+    constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
+    for (const auto& [status, spoil, in_both_times] :
+         {Defect{1, [](auto&roi, auto&) { roi.FastStartTime = kNaN; }},
+          Defect{1, [](auto&roi, auto&) { roi.SlowStartTime = kNaN; }},
+          Defect{10, [](auto&roi, auto&) { roi.FastTimeLength = 0.1; }},  // beyond the horizon
+          Defect{1, [](auto&, auto&dc) { dc.pol[0] = kNaN; }}, Defect{10, [](auto&, auto&dc) { dc.pol[0] = 1e6; }},
+          Defect{10, [](auto&roi, auto&) { roi.FastTimeLength = 0.0; }, true},
+          Defect{10, [](auto&roi, auto&) { roi.SlowTimeLength = 0.0; }, true}}) {
+        if (in_both_times && !GetParam().in_both_times) continue;
         ROI_Obj roi;
         polyDC dc;
         scene_.roi.clone(&roi);
         spoil(roi, dc);
-        const std::size_t before = report_.entries("ERROR_CALL_TREE").size();
         EXPECT_EQ(run(roi, dc), status);
-        expect_unchanged();
-        const auto entries = report_.entries("ERROR_CALL_TREE");
-        ASSERT_GT(entries.size(), before);
-        EXPECT_EQ(entries.back().function, std::string{"GeneralSAROrbit::"} + GetParam().name);
+        EXPECT_EQ(report_.entries().back().function, std::string{"GeneralSAROrbit::"} + GetParam().name);
     }
     EXPECT_EQ(GetParam().run(scene_.orbit, nullptr, &scene_.dc, derived_), 1);
     EXPECT_EQ(GetParam().run(scene_.orbit, &scene_.roi, nullptr, derived_), 1);
@@ -335,20 +271,14 @@ TEST_P(DerivedFailures, LeaveTheOutputsAndSaySo) {
     expect_unchanged();
 }
 
-// Ten or fifty times the same range time: a singular system, of which the mean remains.
+// Ten times the same range time: a singular system, of which the mean remains.
 TEST_P(DerivedFailures, ARegionWithoutExtentGivesNoNaN) {
+    if (GetParam().in_both_times) return;
     test::CapturedStderr captured;
-    const double length_s = std::exchange(scene_.roi.FastTimeLength, 0.0);
-    if (GetParam().in_both_times) {
-        EXPECT_EQ(run(scene_.roi, scene_.dc), 10);
-        scene_.roi.FastTimeLength = length_s;
-        scene_.roi.SlowTimeLength = 0.0;
-        EXPECT_EQ(run(scene_.roi, scene_.dc), 10);
-        return expect_unchanged();
-    }
+    scene_.roi.FastTimeLength = 0.0;
     ASSERT_EQ(run(scene_.roi, scene_.dc), 0);
     EXPECT_THAT(captured.text(), testing::HasSubstr("Singular Matrix"));
-    const auto direct = scene_.truth(scene_.place(0.5, 0.0, 0));
+    const auto direct = scene_.truth({scene_.azimuth(0.5), scene_.range(0.0), 0.0, 0.0});
     for (const std::size_t q : {kRate, kIncidence, kLook}) {
         const poly& constant = *derived_.all()[q];
         if (constant.taz0 == -999.0) continue;  // of another operation
@@ -368,17 +298,20 @@ TEST_P(DerivedFailures, EveryAllocationMayFail) {
 TEST(DerivedOutputs, NullOutputsAreSkipped) {
     Product scene{test::kScenes[2]};
     auto& [orbit, roi, dc] = scene;
-    Derived both, one;
-    scene.derive(both, true);
-    ASSERT_EQ(orbit.SVGetTimeToAnglesPolys(&roi, &dc, nullptr, &one.phi), 0);
-    ASSERT_EQ(orbit.SVGetGroundToTimePolys(&roi, &dc, &one.ground, nullptr), 0);
-    EXPECT_THAT(one.phi.pol, ElementsAreArray(both.phi.pol));
-    EXPECT_THAT(one.ground.pol, ElementsAreArray(both.ground.pol));
-    scene.derive(both, false);
-    ASSERT_EQ(orbit.SVGetSlantToAnglesPolys(&roi, &dc, &one.theta, nullptr), 0);
-    ASSERT_EQ(orbit.SVGetGroundToSlantPolys(&roi, &dc, nullptr, &one.slant), 0);
-    EXPECT_THAT(one.theta.pol, ElementsAreArray(both.theta.pol));
-    EXPECT_THAT(one.slant.pol, ElementsAreArray(both.slant.pol));
+    for (const bool fine : {false, true}) {
+        Derived both, one;
+        scene.derive(both, fine);
+        const auto angles =
+            fine ? &GeneralSAROrbit::SVGetTimeToAnglesPolys : &GeneralSAROrbit::SVGetSlantToAnglesPolys;
+        const auto ground =
+            fine ? &GeneralSAROrbit::SVGetGroundToTimePolys : &GeneralSAROrbit::SVGetGroundToSlantPolys;
+        ASSERT_EQ((orbit.*angles)(&roi, &dc, nullptr, &one.phi) + (orbit.*angles)(&roi, &dc, &one.theta, nullptr),
+                  0);
+        ASSERT_EQ(
+            (orbit.*ground)(&roi, &dc, nullptr, &one.slant) + (orbit.*ground)(&roi, &dc, &one.ground, nullptr), 0);
+        for (const std::size_t q : {kIncidence, kLook, kGround, kSlant})
+            EXPECT_THAT(one.all()[q]->pol, ElementsAreArray(both.all()[q]->pol)) << kUnits[q];
+    }
     EXPECT_EQ(orbit.SVGetFRpoly(&roi, &dc, nullptr), 0);
 }
 

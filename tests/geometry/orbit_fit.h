@@ -3,7 +3,6 @@
 
 #include <gtest/gtest.h>
 
-#include <cstddef>
 #include <vector>
 
 #include "quo_base/interp_orb.h"
@@ -21,15 +20,13 @@ struct Trajectory {
         status = orb_interp(t0, dt, positions.data(), nullptr, static_cast<int>(x.size()), x.data(), y.data(),
                             z.data());
     }
-    [[nodiscard]] unsigned terms() const { return static_cast<unsigned>(x.size()); }
     [[nodiscard]] Vec3 position(double u) const { return at(POSMACRO, u); }
     [[nodiscard]] Vec3 velocity(double u) const { return at(VELMACRO, u); }
-    [[nodiscard]] Vec3 acceleration(double u) const { return at(ACCMACRO, u); }
 
 private:
-    template <typename Macro>
-    [[nodiscard]] Vec3 at(Macro macro, double u) const {
-        return {macro(u, x.data(), terms()), macro(u, y.data(), terms()), macro(u, z.data(), terms())};
+    [[nodiscard]] Vec3 at(double (*macro)(double, const double*, unsigned), double u) const {
+        const auto terms = static_cast<unsigned>(x.size());
+        return {macro(u, x.data(), terms), macro(u, y.data(), terms), macro(u, z.data(), terms)};
     }
 };
 

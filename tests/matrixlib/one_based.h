@@ -1,37 +1,31 @@
 #ifndef QUO_TESTS_ONE_BASED_H
 #define QUO_TESTS_ONE_BASED_H
 
-#include <algorithm>
 #include <cstddef>
+#include <utility>
 #include <vector>
-
-#include "quo_base/alloc_free.h"
 
 namespace test {
 
 using Flat = std::vector<double>;
 
-/** A 1-based matrix, filled from a flat row-major one or with zeros. */
+/** A flat row-major matrix, or zeros, with the row pointers that make it 1-based. */
 class OneBased {
 public:
-    OneBased(int rows, int columns) : rows_{rows}, columns_{columns}, data_{dmatrix(1, rows, 1, columns)} {
-        std::fill_n(&data_[1][1], static_cast<std::ptrdiff_t>(rows) * columns, 0.0);
+    OneBased(Flat flat, int rows, int columns) : flat_{std::move(flat)} {
+        flat_.resize(static_cast<std::size_t>(rows) * static_cast<std::size_t>(columns));
+        for (std::ptrdiff_t i = 0; i < rows; ++i) rows_.push_back(flat_.data() + i * columns - 1);
     }
-    OneBased(const Flat& flat, int rows, int columns) : OneBased{rows, columns} {
-        std::ranges::copy(flat, &data_[1][1]);
-    }
-    ~OneBased() { free_dmatrix(data_, 1, rows_, 1, columns_); }
+    OneBased(int rows, int columns) : OneBased{{}, rows, columns} {}
     OneBased(const OneBased&) = delete;
     OneBased& operator=(const OneBased&) = delete;
 
-    double** get() { return data_; }
-    [[nodiscard]] Flat flat() const {
-        return {&data_[1][1], &data_[1][1] + static_cast<std::ptrdiff_t>(rows_) * columns_};
-    }
+    double** get() { return rows_.data() - 1; }
+    [[nodiscard]] const Flat& flat() const { return flat_; }
 
 private:
-    int rows_, columns_;
-    double** data_;
+    Flat flat_;
+    std::vector<double*> rows_;
 };
 
 }  // namespace test

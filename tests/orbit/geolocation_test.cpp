@@ -111,26 +111,23 @@ TEST_P(Journeys, LeadBack) {
 
 TEST(Earth2Sat, KnowsItsEndsToATenthOfAMillisecondAndItsSpeed) {
     test::Flight flight{kTimes};
-    for (const double beyond_s : {-0.3, 0.0, 0.9e-4, 1.1e-4, 0.01, 300.0})
+    for (const double beyond_s : {-0.3, 0.0, 0.9e-4, 1.1e-4, 300.0})
         for (const double t_seen : {kTimes.first_s - beyond_s, kTimes.last() + beyond_s}) {
             SCOPED_TRACE(testing::Message() << beyond_s << " s beyond, at " << t_seen);
             const bool seen = beyond_s < 1e-4;
             const Vec3 target = target_beside(flight.state(t_seen));
+            EXPECT_EQ(std::isnan(flight.orbit.earth2satAzimuth(target.v)), !seen);
             for (const bool precise : {false, true}) {
-                double t = -7.0, range = -8.0;
+                double t = -7.0, range = -8.0;  // nor does the speed allow every Doppler
+                for (const double fd : {2.75e5, -2.75e5, 1e300}) {
+                    EXPECT_EQ(flight.orbit.earth2satLinear(target.v, &t, &range, fd), QUO_NOT_SEEN);
+                    EXPECT_EQ(locate(flight.orbit, precise, target, &t, &range, fd), QUO_NOT_SEEN);
+                }
+                EXPECT_EQ(t + range, -15.0);
                 EXPECT_EQ(locate(flight.orbit, precise, target, &t, &range), seen ? 0 : QUO_NOT_SEEN);
                 EXPECT_NEAR(t, seen ? t_seen : -7.0, 2e-8);
                 EXPECT_EQ(range == -8.0, !seen);
             }
-            EXPECT_EQ(std::isnan(flight.orbit.earth2satAzimuth(target.v)), !seen);
-            double t = -7.0, range = -8.0;  // nor does the speed allow every Doppler
-            for (const double fd : {2.75e5, -2.75e5, 1e300}) {
-                SCOPED_TRACE(fd);
-                EXPECT_EQ(flight.orbit.earth2satLinear(target.v, &t, &range, fd), QUO_NOT_SEEN);
-                for (const bool precise : {false, true})
-                    EXPECT_EQ(locate(flight.orbit, precise, target, &t, &range, fd), QUO_NOT_SEEN);
-            }
-            EXPECT_EQ(t + range, -15.0);
         }
 }
 
@@ -201,9 +198,9 @@ TEST(EveryCall, RefusesWhatIsNotFiniteAndWhatHasNoModel) {
         double in[] = {kTimes.first_s + 70.0, 5.4e-3, 0.3, 17.3}, out[9] = {};
         if (search || linear) std::copy_n(target.v, 3, in);
         EXPECT_EQ(call.run(flight.orbit, in, out), 0);
-        const auto expect_refused = [&](GeneralSAROrbit& orbit, double sum) {
+        const auto expect_refused = [&](GeneralSAROrbit& orbit, double sum, int status = QUO_REFUSED) {
             std::ranges::fill(out, 2.5);
-            EXPECT_EQ(call.run(orbit, in, out), QUO_REFUSED);
+            EXPECT_EQ(call.run(orbit, in, out), status);
             EXPECT_EQ(std::accumulate(out, out + 9, 0.0), sum);
             EXPECT_EQ(report.entries().size(), ++refused);
         };
@@ -213,6 +210,13 @@ TEST(EveryCall, RefusesWhatIsNotFiniteAndWhatHasNoModel) {
                 expect_refused(flight.orbit, 22.5);
                 in[i] = good;
             }
+        if (call.inputs >= 3 && !search && !linear) {  // ground that cannot be seen
+            for (const double range : {4e-3, 5e-2, -5.4e-3}) {
+                in[1] = range;
+                expect_refused(flight.orbit, 22.5, range > 0.0 ? QUO_NUMERIC : QUO_REFUSED);
+            }
+            EXPECT_TRUE(report.entries().back().function.starts_with("GeneralSAROrbit::"));
+        }
         // Without a model the searches say -1.0 in both outputs.
         for (GeneralSAROrbit* orbit : {&empty, &unfilled}) expect_refused(*orbit, search ? 15.5 : 22.5);
     }
@@ -229,18 +233,12 @@ TEST(EveryCall, RefusesWhatIsNotFiniteAndWhatHasNoModel) {
 template <typename... Doppler>
 std::vector<double> returned(GeneralSAROrbit& o, double t, double range, Doppler... fd) {
     const double* p = o.sat2earth(t, range, fd...);
-    return std::vector{p[0],
-                       p[1],
-                       p[2],
-                       o.SVGetLat(t, range, fd...),
-                       o.SVGetLon(t, range, fd...),
-                       o.SVGetAnglesIncidence(t, range, fd...),
-                       o.SVGetAnglesLook(t, range, fd...),
-                       o.SVGetFR(t, range, fd...),
-                       o.SVGetSatSpeed(t, range, fd...),
-                       o.sat2earthX(t, range, fd...),
-                       o.sat2earthY(t, range, fd...),
-                       o.sat2earthZ(t, range, fd...)};
+    std::vector<double> v{p[0], p[1], p[2], o.SVGetLat(t, range, fd...), o.SVGetLon(t, range, fd...)};
+    v.insert(v.end(), {o.SVGetAnglesIncidence(t, range, fd...), o.SVGetAnglesLook(t, range, fd...)});
+    v.insert(v.end(), {o.SVGetFR(t, range, fd...), o.SVGetSatSpeed(t, range, fd...)});
+    v.insert(v.end(),
+             {o.sat2earthX(t, range, fd...), o.sat2earthY(t, range, fd...), o.sat2earthZ(t, range, fd...)});
+    return v;
 }
 template <typename... Doppler>
 std::vector<double> written(GeneralSAROrbit& o, double t, double range, Doppler... fd) {
@@ -307,11 +305,10 @@ TEST(RotationMatrix, TurnsTheVelocityAlongTheFirstAxis) {
     for (const Vec3& v : {Vec3{1.7, -2.3, 0.9}, Vec3{-5031.1, 2290.7, 5180.3}, Vec3{0.0, -3.1, 0.7}}) {
         ASSERT_EQ(GeneralSAROrbit::computeRotationMatrix(v.v, R, &speed), 0);
         EXPECT_DOUBLE_EQ(speed, v[0] < 0.0 ? -test::norm(v) : test::norm(v));
-        EXPECT_NEAR(R[0] * v[0] + R[3] * v[1] + R[6] * v[2], speed, 1e-12 * std::abs(speed));
         // The angles as they are defined.
-        const double yaw = std::atan(-v[1] / v[0]);
+        const double yaw = std::atan(-v[1] / v[0]), c = std::cos(yaw), s = std::sin(yaw);
         const double pitch = std::atan(-v[2] / std::copysign(std::hypot(v[0], v[1]), v[0]));
-        const double c = std::cos(yaw), s = std::sin(yaw), cp = std::cos(pitch), sp = std::sin(pitch);
+        const double cp = std::cos(pitch), sp = std::sin(pitch);
         const double rows[9] = {c * cp, s, sp * c, -s * cp, c, -s * sp, -sp, 0.0, cp};
         for (int i = 0; i < 9; ++i) EXPECT_NEAR(R[i], rows[i], 1e-15) << i;
     }
@@ -319,8 +316,7 @@ TEST(RotationMatrix, TurnsTheVelocityAlongTheFirstAxis) {
     ASSERT_EQ(GeneralSAROrbit::computeRotationMatrix(upright, R, &speed), 0);
     EXPECT_EQ(speed - R[6], 6.3);
     ASSERT_EQ(GeneralSAROrbit::computeRotationMatrix(still, R, &speed), 0);
-    for (const double* bad : {broken, static_cast<const double*>(nullptr)})
-        EXPECT_EQ(GeneralSAROrbit::computeRotationMatrix(bad, R, &speed), QUO_REFUSED);
+    EXPECT_EQ(GeneralSAROrbit::computeRotationMatrix(broken, R, &speed), QUO_REFUSED);
     EXPECT_EQ(R[0] + R[4] + R[8] + speed, 3.0);
 }
 

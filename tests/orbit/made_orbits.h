@@ -10,36 +10,21 @@
 
 namespace test {
 
-/** An elliptic orbit in the field of a point mass, seen from the rotating Earth; eccentricity 0 is a circle. At
- * time 0 the platform passes its perigee, above a place and with a heading as in CircularOrbit. */
-class EllipticOrbit {
-public:
-    EllipticOrbit(double latitude_deg, double longitude_deg, double heading_deg, double eccentricity)
-        : eccentricity_{eccentricity} {
-        const Platform perigee = CircularOrbit{latitude_deg, longitude_deg, heading_deg}.inertial(0.0);
-        outward_ = unit(perigee.position);
-        along_ = unit(perigee.velocity);
-    }
-    [[nodiscard]] Platform earth_fixed(double t) const { return to_earth_fixed(inertial(t), t); }
-
-private:
-    [[nodiscard]] Platform inertial(double t) const {
-        const double axis_m = (kSemiMajor + 693e3) / (1.0 - eccentricity_);
-        const double rate = std::sqrt(kGravity / axis_m) / axis_m,
-                     flat = std::sqrt(1.0 - eccentricity_ * eccentricity_);
-        double E = rate * t;  // Kepler's equation
-        for (int step = 0; step < 50; ++step)
-            E -= (E - eccentricity_ * std::sin(E) - rate * t) / (1.0 - eccentricity_ * std::cos(E));
-        const double c = std::cos(E), s = std::sin(E), E1 = rate / (1.0 - eccentricity_ * c);
-        const Vec3 position = axis_m * ((c - eccentricity_) * outward_ + flat * s * along_);
-        const Vec3 velocity = axis_m * E1 * (flat * c * along_ - s * outward_);
-        const double r = norm(position);
-        return {position, velocity, -kGravity / (r * r * r) * position};
-    }
-
-    double eccentricity_;
-    Vec3 outward_{}, along_{};
-};
+/** State on an elliptic orbit in the field of a point mass, seen from the rotating Earth. At time 0 the platform
+ * passes its perigee, above the place and with the heading of a circular orbit; eccentricity 0 is that circle. */
+inline Platform elliptic_orbit(const CircularOrbit& circle, double eccentricity, double t) {
+    const Vec3 outward = unit(circle.inertial(0.0).position), along = unit(circle.inertial(0.0).velocity);
+    const double axis_m = norm(circle.inertial(0.0).position) / (1.0 - eccentricity);
+    const double rate = std::sqrt(kGravity / axis_m) / axis_m, flat = std::sqrt(1.0 - eccentricity * eccentricity);
+    double E = rate * t;  // Kepler's equation
+    for (int step = 0; step < 50; ++step)
+        E -= (E - eccentricity * std::sin(E) - rate * t) / (1.0 - eccentricity * std::cos(E));
+    const double c = std::cos(E), s = std::sin(E), E1 = rate / (1.0 - eccentricity * c);
+    return to_earth_fixed({axis_m * ((c - eccentricity) * outward + flat * s * along),
+                           axis_m * E1 * (flat * c * along - s * outward),
+                           {}},
+                          t);
+}
 
 /** When the state vectors of a made orbit stand: uneven numbers, and half a spacing off the orbit's time 0. */
 struct Times {
