@@ -1,4 +1,6 @@
-// Runs the sessions of data/diagnostics/sessions.txt, where their form is told.
+// Runs the sessions of data/diagnostics/sessions.txt.
+#include "support/session.h"
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -6,13 +8,9 @@
 #include <cstdlib>
 #include <ctime>
 #include <filesystem>
-#include <fstream>
 #include <functional>
-#include <iomanip>
 #include <map>
-#include <sstream>
 #include <string>
-#include <vector>
 
 #include "quo_base/ckerr.h"
 #include "quo_base/quorelReport.h"
@@ -32,14 +30,6 @@ namespace {
 
 constexpr char kScript[] = QUO_TEST_DATA "/diagnostics/sessions.txt";
 
-std::vector<std::string> titles() {
-    std::vector<std::string> all;
-    std::istringstream script{test::read_text(kScript)};
-    for (std::string line; std::getline(script, line);)
-        if (line.starts_with("== ")) all.push_back(line.substr(3));
-    return all;
-}
-
 class Session : public testing::TestWithParam<std::string> {
 protected:
     Session() {
@@ -57,18 +47,13 @@ protected:
         exit_ckerr();
     }
 
-    /** Carries out a call of words. What is left out is said for it. */
-    int call(std::istream& line) {
-        std::vector<std::string> words;
-        for (std::string word; line >> std::quoted(word);) words.push_back(word);
-        const auto text = [&](std::size_t i, const char* otherwise = nullptr) {
-            if (i < words.size()) otherwise = words[i] == "(null)" ? nullptr : words[i].c_str();
-            return otherwise;
-        };
-        const auto number = [&](std::size_t i) { return std::stoi(text(i, "1")); };
-        const bool inside = words.size() > 1 && !words[1].empty() && words[1].find_first_of("/(") != 0;
-        const std::string path = inside ? folder_.file(words[1]) : "";
-        const char* const file = inside ? path.c_str() : text(1);
+    /** Files are those of a folder of the session's own. */
+    int call(const test::Words& words, std::string& told) {
+        const std::string given = words.text(1) ? words.text(1) : "",
+                          path = given.empty() || given[0] == '/' ? given : folder_.file(given);
+        const char* const file = words.text(1) ? path.c_str() : nullptr;
+        const auto text = [&](std::size_t n, const char* otherwise = nullptr) { return words.text(n, otherwise); };
+        const auto number = [&](std::size_t n) { return words.whole(n); };
         const auto tried = [](int result, int there = 1) {  // a file that is not there tells so
             if (result * there == 0) errno = EXDEV;
             return result;
@@ -88,10 +73,10 @@ protected:
             {"level?", ckflg_report},
             {"close", exit_report},
             {"there", [&] { return tried(std::filesystem::exists(path) ? 1 : 0); }},
-            {"show", [&] { return shown_ = test::read_text(path), 0; }},
+            {"show", [&] { return told = test::read_text(path), 0; }},
             {"object",
              [&] {
-                 return words.size() < 2 ? object().getLevel() : quorelReport{file, number(2)}.getLevel();
+                 return !words.text(1) ? object().getLevel() : quorelReport{file, number(2)}.getLevel();
              }},
             {"setReportName", [&] { return object().setReportName(file), ckflg_report(); }},
             {"setLevel", [&] { return object().setLevel(number(1)), object().getLevel(); }},
@@ -119,41 +104,26 @@ protected:
              }},
             {"progress", [&] {
                  errno = 0;
-                 const int status = object().progress_update(std::stof(words.at(1)), text(2));
+                 const int status = object().progress_update(std::stof(given), text(2));
                  return errno == 0 ? (errno = EXDEV, status) : -1;
              }}};
-        return calls.at(words.at(0))();
+        return calls.at(words.text(0))();
     }
 
+private:
     test::TemporaryFolder folder_;
-    std::string shown_;
 };
 
 TEST_P(Session, AnswersAndWritesWhatTheScriptSays) {
-    std::istringstream script{test::read_text(kScript)};
-    std::string line, told, wanted;
-    while (std::getline(script, line) && line != "== " + GetParam()) {
-    }
-    while (std::getline(script, line) && !line.starts_with("== ")) {
-        if (line.starts_with('|'))
-            wanted += line.ends_with('\\') ? line.substr(2, line.size() - 3) : line.erase(0, 2) + "\n";
-        if (!line.starts_with("$ ")) continue;
-        EXPECT_EQ(told, wanted) << "before " << line;
-        const std::size_t equals = line.find(" = ");
-        std::istringstream words{line.substr(2, equals - 2)};
-        test::CapturedStderr echo;
+    test::run_session(kScript, GetParam(), [this](const test::Words& words, std::string& told) {
         errno = EXDEV;
-        const std::string result = std::to_string(call(words));
-        EXPECT_EQ(errno, EXDEV) << line;
-        if (equals != line.npos) {
-            EXPECT_EQ(result, line.substr(equals + 3)) << line;
-        }
-        told = echo.text() + std::exchange(shown_, "");
-        wanted.clear();
-    }
-    EXPECT_EQ(told, wanted);
+        const int result = call(words, told);
+        EXPECT_EQ(errno, EXDEV) << words.text(0);
+        return result;
+    });
 }
-INSTANTIATE_TEST_SUITE_P(Script, Session, testing::ValuesIn(titles()), [](const auto& row) { return row.param; });
+INSTANTIATE_TEST_SUITE_P(Script, Session, testing::ValuesIn(test::sessions_of(kScript)),
+                         [](const auto& row) { return row.param; });
 
 // ---- Bounds
 
