@@ -1,6 +1,5 @@
 #include <gtest/gtest.h>
 
-#include <climits>
 #include <cmath>
 
 #include "signallib/engines.h"
@@ -36,32 +35,5 @@ TEST_P(Czt, EqualsTheDirectSum) {
     }
 }
 INSTANTIATE_TEST_SUITE_P(Engines, Czt, testing::ValuesIn(test::kEngines), testing::PrintToStringParamName());
-
-TEST(CztPlans, RefuseWhatCannotBe) {
-    const test::Engine engine{"fftw"};
-    CztPlan plan{};
-    for (const auto& [n, m] : {std::pair{0, 4}, {4, 0}, {INT_MAX, INT_MAX}, {INT_MAX, 1}})
-        EXPECT_EQ(czt_makep_c(&plan, n, m), 1) << n << " " << m;
-    EXPECT_EQ(czt_destp_c(&plan), 0) << "a record of zeros holds nothing to release";
-    ASSERT_EQ(czt_makep_c(&plan, 6, 4), 0);
-    Samples data = test::noise(24), apart(8);
-    const Samples before = data;
-    fcomplex *const d = data.data(), *const none = nullptr;
-    for (const auto& [in, out, count, status] : {std::tuple{d, none, 1, 1},
-                                                 {none, d, 1, 1},
-                                                 {d, d + 11, 2, 1},
-                                                 {d, d + 12, -1, 1},
-                                                 {d, d + 12, 0, 0},
-                                                 {d, apart.data(), 2, 0}}) {
-        EXPECT_EQ(pczt_c(&plan, in, out, 0.1, 0.2, count), status);
-        EXPECT_EQ(data, before);
-    }
-    EXPECT_EQ(pczt_c(&plan, d, d, 0.1, 0.2, 2), 0) << "shrinks as it goes";
-    EXPECT_TRUE(std::equal(apart.begin(), apart.end(), data.begin()));
-    CztPlan copy = plan;
-    EXPECT_EQ(czt_destp_c(&plan), 0);
-    EXPECT_EQ(czt_destp_c(&copy), 1) << "released already";
-    EXPECT_EQ(pczt_c(&plan, d, apart.data(), 0.1, 0.2, 1), 1);
-}
 
 }  // namespace
