@@ -1,17 +1,12 @@
 #include <dlfcn.h>
 #include <gtest/gtest.h>
-#include <sys/resource.h>
-#include <unistd.h>
 
-#include <climits>
-#include <fstream>
 #include <string>
 
 #include "signallib/engines.h"
 #include "signallib/fft_engine.h"
 #include "signallib/memory_room.h"
 #include "signallib/plan_store.h"
-#include "support/diagnostics.h"
 
 #ifdef __SANITIZE_ADDRESS__
 // What cannot be had is asked for on purpose here, and what is given back must be there to be had again.
@@ -25,32 +20,6 @@ namespace {
 using test::Engine;
 using test::Samples;
 
-// A missing engine is told with a way out. Once it stood in the report, where plans write nothing.
-TEST(FftEngine, IsTheOneAskedForOrTheOneThereIs) {
-    const test::Report report;
-    const std::string fake = QUO_TEST_FAKE_DFTI, module = QUO_TEST_FFTW_MODULE, none = "/nowhere/lib.so";
-    const struct {
-        std::string choice, mkl, fftw, name;
-    } rows[] = {{"mkl", fake, module, "mkl"}, {"fftw", fake, module, "fftw"}, {"auto", fake, none, "mkl"},
-                {"", none, module, "fftw"},   {"mkl", none, module, "none"},  {"fftw", fake, none, "none"},
-                {"auto", none, fake, "none"}, {"auto", module, none, "none"}};
-    for (const auto& [choice, mkl, fftw, name] : rows) {
-        const Engine engine{choice, mkl, fftw};
-        FftPlan plan{};
-        EXPECT_EQ(fft_engine_name(), name) << choice << " " << mkl << " " << fftw;
-        EXPECT_EQ(errno, 0) << "what the loader left";
-        for (const int down : {0, 1}) {
-            EXPECT_EQ(fft_makep_c(&plan, 8, 8, 4, 4, 1 - down, 1, 1), name == "none" ? 4 + down : 0);
-            EXPECT_EQ(std::string{fft_engine_error()}.find("QUO_FFTW_MODULE") != std::string::npos,
-                      name == "none");
-            EXPECT_EQ(fft_destp_c(&plan), 0);
-        }
-        EXPECT_EQ(fft_makep_c(&plan, 8, 8, 4, 4, 0, 0, 1), 0) << "nothing to transform";
-        EXPECT_STREQ(fft_engine_error(), "");
-    }
-    EXPECT_TRUE(report.entries().empty());
-}
-
 TEST(FftEngine, AutoPrefersMklOnProcessorsOfItsMakerOnly) {
     const auto own = quo::engine_order("auto", true), other = quo::engine_order("auto", false);
     EXPECT_EQ(own.first, quo::engine_order("mkl", false).first);
@@ -59,45 +28,7 @@ TEST(FftEngine, AutoPrefersMklOnProcessorsOfItsMakerOnly) {
     EXPECT_EQ(quo::engine_order("mkl", true).second, nullptr);
 }
 
-/** Leaves the process so many bytes of address space beyond what it has. */
-class AddressSpace {
-public:
-    explicit AddressSpace(rlim_t bytes) {
-        getrlimit(RLIMIT_AS, &before_);
-        std::ifstream pages{"/proc/self/statm"};
-        rlim_t taken = 0;
-        pages >> taken;
-        const rlimit limit{taken * static_cast<rlim_t>(sysconf(_SC_PAGESIZE)) + bytes, before_.rlim_max};
-        setrlimit(RLIMIT_AS, &limit);
-    }
-    ~AddressSpace() {
-        setrlimit(RLIMIT_AS, &before_);
-        errno = 0;
-    }
-    AddressSpace(const AddressSpace&) = delete;
-    AddressSpace& operator=(const AddressSpace&) = delete;
-
-private:
-    rlimit before_{};
-};
-
 // FFTW ended the process when an allocation of its own failed, while it planned and while it ran.
-TEST(FftMemory, BeyondWhatThereIsIsRefusedBeforeTheEngineAsksForIt) {
-    const test::Report report;
-    const Engine engine{"fftw"};
-    FftPlan plan{};
-    Samples data = test::noise(8);
-    for (const auto& make : {fft_makep_c, fft_makep_r})
-        for (const auto& [n, m, down] : {std::tuple{INT_MAX, 1, 0}, {1, INT_MAX, 1}, {7, INT_MAX, 1}}) {
-            const AddressSpace limit{1 << 30};
-            EXPECT_EQ(make(&plan, n, n, m, m, 1 - down, down, 1), 4 + down);
-            EXPECT_NE(std::string{fft_engine_error()}.find("not enough memory"), std::string::npos);
-            EXPECT_EQ(fft_c(8, 8, 1, 1, 1, 0, data.data(), data.data()), 0) << "the next one that fits";
-        }
-    EXPECT_EQ(plan.n, 0);
-    EXPECT_EQ(quo::plan_store().held(), 0U);
-    EXPECT_TRUE(report.entries("ERROR").empty());
-}
 TEST(FftMemory, ShortageOfAnyDegreeGivesAStatus) {
     const Engine engine{"fftw"};
     constexpr int kPrime = 60539;  // runs through buffers of several times its length
@@ -106,7 +37,7 @@ TEST(FftMemory, ShortageOfAnyDegreeGivesAStatus) {
         SCOPED_TRACE(testing::Message() << n << " x " << m);
         int status = -1;
         for (rlim_t room = 256 << 10; status != 0 && room < rlim_t{1} << 30; room += room / 3) {
-            const AddressSpace limit{room};
+            const test::AddressSpace limit{room};
             status = fft_c(n, n, m, m, n > m, n <= m, data.data(), data.data());
             EXPECT_TRUE(status == 0 || status == (n > m ? 4 : 5) || status == 7) << status;
         }
@@ -115,7 +46,7 @@ TEST(FftMemory, ShortageOfAnyDegreeGivesAStatus) {
     FftPlan plan{};
     ASSERT_EQ(fft_makep_c(&plan, kPrime, kPrime, 1, 1, 1, 0, 1), 0);
     {
-        const AddressSpace limit{0};
+        const test::AddressSpace limit{0};
         EXPECT_EQ(pfft_c(&plan, data.data(), data.data()), 7);
     }
     EXPECT_EQ(pfft_c(&plan, data.data(), data.data()) + fft_destp_c(&plan), 0);
@@ -129,28 +60,6 @@ TEST(FftMemory, ShortageOfAnyDegreeGivesAStatus) {
 template <typename Function>
 Function* symbol(void* library, const char* name) {
     return reinterpret_cast<Function*>(dlsym(library, name));
-}
-
-TEST(FftEngine, MklIsMadeSequentialAndGivesDescriptorsBack) {
-    const Engine engine{"mkl"};
-    ASSERT_STREQ(fft_engine_name(), "mkl");
-    void* const library = dlopen(QUO_TEST_FAKE_DFTI, RTLD_NOW | RTLD_NOLOAD);
-    const auto live = symbol<long()>(library, "fake_live_descriptors");
-    EXPECT_EQ(symbol<int()>(library, "fake_threading_layer")(), 1);
-    const long before = live();
-    for (const char* call : {"create", "set", "commit"}) {
-        setenv("FAKE_DFTI_FAILS", call, 1);
-        FftPlan plan{};
-        EXPECT_EQ(fft_makep_c(&plan, 27, 27, 4, 4, 1, 0, 1), 4) << call;
-        EXPECT_EQ(fft_makep_c(&plan, 27, 27, 4, 4, 0, 1, 1), 5) << call;
-        EXPECT_EQ(live(), before) << call;
-        EXPECT_EQ(std::string{fft_engine_error()}.find("mkl: transforms of length 4 are refused, status "), 0U);
-    }
-    setenv("FAKE_DFTI_FAILS", "compute", 1);
-    Samples data = test::noise(27);
-    EXPECT_EQ(fft_c(27, 27, 1, 1, 1, 0, data.data(), data.data()), QUO_NO_MEMORY);
-    unsetenv("FAKE_DFTI_FAILS");
-    dlclose(library);
 }
 
 TEST(FftwModule, ExportsItsEntryAloneAndRefusesOtherInterfaces) {

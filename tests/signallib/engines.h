@@ -2,10 +2,13 @@
 #define QUO_TESTS_SIGNALLIB_ENGINES_H
 
 #include <gtest/gtest.h>
+#include <sys/resource.h>
+#include <unistd.h>
 
 #include <cerrno>
 #include <complex>
 #include <cstdlib>
+#include <fstream>
 #include <numbers>
 #include <ostream>
 #include <random>
@@ -58,6 +61,28 @@ protected:
 
 private:
     Engine engine_{GetParam().choice, GetParam().mkl};
+};
+
+/** Leaves the process so many bytes of address space beyond what it has. */
+class AddressSpace {
+public:
+    explicit AddressSpace(rlim_t bytes) {
+        getrlimit(RLIMIT_AS, &before_);
+        std::ifstream pages{"/proc/self/statm"};
+        rlim_t taken = 0;
+        pages >> taken;
+        const rlimit limit{taken * static_cast<rlim_t>(sysconf(_SC_PAGESIZE)) + bytes, before_.rlim_max};
+        setrlimit(RLIMIT_AS, &limit);
+    }
+    ~AddressSpace() {
+        setrlimit(RLIMIT_AS, &before_);
+        errno = 0;
+    }
+    AddressSpace(const AddressSpace&) = delete;
+    AddressSpace& operator=(const AddressSpace&) = delete;
+
+private:
+    rlimit before_{};
 };
 
 inline Samples noise(std::size_t count, unsigned seed = 17) {

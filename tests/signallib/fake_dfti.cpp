@@ -27,7 +27,7 @@ struct Descriptor {
 };
 
 int threading_layer = -1;
-Long live = 0;
+int live = 0;
 
 bool told_to_fail(std::string_view call) {
     const char* name = std::getenv("FAKE_DFTI_FAILS");
@@ -79,7 +79,7 @@ Long compute(void* handle, void* in, std::va_list more, double sign) {
 
 FAKE_API int MKL_Set_Threading_Layer(int layer) { return threading_layer = layer; }
 FAKE_API int fake_threading_layer() { return threading_layer; }
-FAKE_API long fake_live_descriptors() { return live; }
+FAKE_API int fake_live_descriptors() { return live; }
 
 FAKE_API Long DftiCreateDescriptor(void** handle, int precision, int domain, Long dimensions, ...) {
     std::va_list more;

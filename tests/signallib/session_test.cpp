@@ -1,6 +1,8 @@
 // Runs the sessions of data/signals/sessions.txt: what plans and resampling refuse.
 #include "support/session.h"
 
+#include <dlfcn.h>
+
 #include <algorithm>
 #include <functional>
 #include <map>
@@ -9,6 +11,7 @@
 
 #include "quo_base/interp.h"
 #include "signallib/engines.h"
+#include "signallib/plan_store.h"
 
 namespace {
 
@@ -67,7 +70,30 @@ protected:
              }},
             {"clone", [&] { return std::copy_n(at(1), n(3), at(2)), 0; }},
             {"same", [&] { return std::equal(at(1), at(1) + n(3), at(2)) ? 1 : 0; }},
-            {"no_engine", [&] { return engine_.reset(), engine_.emplace("fftw", "", "/nowhere/fftw.so"), 0; }},
+            {"engine",
+             [&] {
+                 const std::map<std::string, const char*> files = {
+                     {"fake", QUO_TEST_FAKE_DFTI}, {"fftw", QUO_TEST_FFTW_MODULE}, {"none", "/nowhere/lib.so"}};
+                 engine_.reset();
+                 engine_.emplace(plan, files.at(words.text(2)), files.at(words.text(3)));
+                 return told = fft_engine_name() + std::string{"\n"}, errno;
+             }},
+            {"fft_engine_error",
+             [&] {
+                 return told = std::string{fft_engine_error()}.substr(
+                                   0, static_cast<std::size_t>(words.number(1, "999"))) +
+                               "\n",
+                        0;
+             }},
+            {"held", [] { return static_cast<int>(quo::plan_store().held()); }},
+            {"room", [&] { return room_.emplace(static_cast<rlim_t>(words.number(1))), 0; }},
+            {"refuse", [&] { return setenv("FAKE_DFTI_FAILS", words.text(1), 1); }},
+            {"fake",
+             [&] {
+                 void* const library = dlopen(QUO_TEST_FAKE_DFTI, RTLD_NOW | RTLD_NOLOAD);
+                 const int number = reinterpret_cast<int (*)()>(dlsym(library, words.text(1)))();
+                 return dlclose(library), number - std::exchange(faked_[plan], number);
+             }},
             {"report", [&] {
                  for (const auto& entry : report_.entries())
                      told += entry.kind + " " + entry.file + " " + entry.function + "\n";
@@ -78,10 +104,12 @@ protected:
 
     const test::Report report_;
     std::optional<test::Engine> engine_{std::in_place, "fftw"};
+    std::optional<test::AddressSpace> room_;
     test::Samples samples_ = test::noise(1024);
     std::map<std::string, FftPlan> fft_;
     std::map<std::string, CztPlan> czt_;
     interp interp_;
+    std::map<std::string, int> faked_;
 };
 
 TEST_P(Session, RefusesWhatTheScriptSays) {
