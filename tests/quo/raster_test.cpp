@@ -15,28 +15,6 @@ namespace {
 
 using RasterVerbs = test::RasterFolder;
 
-// The tool itself widens and narrows samples of 8 bits; the other types are the library's. Prefixes are dropped.
-TEST_F(RasterVerbs, ConvertKnowsSamplesOfEightBits) {
-    constexpr const char* kNames[] = {"FLOAT_COMPLEX", "FLOAT32", "DOUBLE_COMPLEX", "FLOAT64",
-                                      "INT32_COMPLEX", "INT32",   "SHORT_COMPLEX",  "INT16",
-                                      "INT8_COMPLEX",  "INT8"};
-    for (int pair = 0; pair < 100; ++pair) {
-        const int from = pair / 10, to = pair % 10;
-        if ((from < INT8_COMPLEX && to < INT8_COMPLEX) || (from % 2 == 0 && to % 2 == 1)) continue;
-        SCOPED_TRACE(std::string{kNames[from]} + " to " + kNames[to]);
-        const std::string in = make("in.raw", 3, 5, from, 1, 2), out = file("out.raw");
-        const test::Finished finished =
-            test::quo({"convert", in, out, "--type", kNames[to], "--prefix", "drop", "--order", "m"});
-        ASSERT_EQ(finished.exit_status, 0) << finished.err;
-        std::string expected;
-        for (int i = 0; i < 15; ++i)
-            for (int part = 0; part <= 1 - to % 2; ++part)
-                test::append_part(expected, to,
-                                  part == 0 || from % 2 == 0 ? test::part_value(i / 5, i % 5, part) : 0.0, true);
-        EXPECT_TRUE(test::read_text(out) == expected);
-    }
-}
-
 /** The samples of a grey picture. */
 std::vector<unsigned char> grey_of(const std::string& name) {
     png_image image{};
