@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <cstring>
 #include <limits>
+#include <ostream>
 #include <string>
 #include <type_traits>
 #include <utility>
@@ -32,6 +33,7 @@ struct Layout {
     int64_t offset;
     int buffer;  // of a DataFile
 };
+void PrintTo(const Layout& layout, std::ostream* out) { *out << layout.name; }
 constexpr Layout kLayouts[] = {{"LittleEndian", 0, 0, 0, 0},
                                {"BigEndianPrefix", 1, 3, 0, 0},
                                {"LittleEndianLargePrefix", 0, 6000, 7, 0},
@@ -205,8 +207,7 @@ TEST_P(EveryPair, HasSingleSamplesOfItsOwnTypeInTheHostsOrder) {
             }
         }
 }
-INSTANTIATE_TEST_SUITE_P(Layouts, EveryPair, testing::ValuesIn(kLayouts),
-                         [](const auto& row) { return row.param.name; });
+INSTANTIATE_TEST_SUITE_P(Layouts, EveryPair, testing::ValuesIn(kLayouts), testing::PrintToStringParamName());
 
 struct Rounding {
     double value;

@@ -14,15 +14,19 @@
 
 namespace test {
 
-/** A line of a script, and the value that its session runs with:
+/** @file
+ * Scripts of sessions: calls and what they answer.
  *
  *   == title               begins a session
  *   == title for 1 2 17    begins one that runs with each of the values, which "@" stands for
- *   $ call words = result  carries out a call; what it returns is told where it is looked at
- *   | line                 that the call tells or writes to the error stream, and there are no others; a last "\"
- * stands for no line feed
+ *   $ call words = result  carries out a call, whose result may be left out
+ *   | line                 that the call tells, or writes to the error stream: all of them; a "\" at its end stands
+ *                          for no line feed
+ *   # text                 is for the reader
  *
- * Anything else is for the reader. Words may be quoted; "(null)" is none, and "x*17" seventeen times x. */
+ * Words may be quoted; "(null)" is none, and "x*17" seventeen times x. */
+
+/** The words of a call, its name first. */
 class Words {
 public:
     explicit Words(const std::string& line) {
@@ -74,9 +78,12 @@ void run_session(const char* script, const std::string& session, Call call) {
     }
     while (std::getline(lines, line) && !line.starts_with("== ")) {
         for (std::size_t at = 0; (at = line.find('@')) != line.npos;) line.replace(at, 1, value);
-        if (line.starts_with('|'))
+        if (line.empty() || line[0] == '#') continue;
+        if (line[0] == '|') {
             wanted += line.ends_with('\\') ? line.substr(2, line.size() - 3) : line.erase(0, 2) + "\n";
-        if (!line.starts_with("$ ")) continue;
+            continue;
+        }
+        ASSERT_TRUE(line.starts_with("$ ")) << line;
         EXPECT_EQ(told, std::exchange(wanted, "")) << "before " << line;
         told.clear();
         const std::size_t equals = line.rfind(" = ");
