@@ -25,19 +25,6 @@ constexpr char kSource[] = "frames.cpp";
 
 using Calls = test::Tracking;
 
-TEST_F(Calls, AreTrackedBetweenInitAndExit) {
-    EXPECT_EQ(set_ckerr_fun("f()"), 1);
-    EXPECT_EQ(init_ckerr_locking(), 0);  // a second time: nothing changes
-    EXPECT_EQ(ckflg_ckerr(), 1);
-    mark();
-    EXPECT_EQ(leak_lines(), "f() : 0\t1\t\n");
-    EXPECT_EQ(ckflg_ckerr(), 0);
-    EXPECT_EQ(set_ckerr_fun("unseen()"), 1);
-    init_ckerr_locking();
-    mark();
-    EXPECT_EQ(leak_lines(), "main() : 0\t\n");
-}
-
 // A name that ends with its memory: one byte more and the test dies.
 TEST_F(Calls, NamesAreCopiedBoundedAndReadNoFurtherThanTheirRoom) {
     const auto page = static_cast<std::size_t>(sysconf(_SC_PAGESIZE));

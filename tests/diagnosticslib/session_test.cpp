@@ -11,6 +11,7 @@
 #include <functional>
 #include <map>
 #include <string>
+#include <vector>
 
 #include "quo_base/ckerr.h"
 #include "quo_base/quorelReport.h"
@@ -45,6 +46,7 @@ protected:
         const test::CapturedStderr quiet;
         exit_report();
         exit_ckerr();
+        for (void* block : blocks_) free_ckerr(block);
     }
 
     /** Files are those of a folder of the session's own. */
@@ -58,10 +60,19 @@ protected:
             if (result * there == 0) errno = EXDEV;
             return result;
         };
+        const auto had = [this](void* block) {
+            blocks_.push_back(block);
+            return block ? 1 : std::exchange(errno, EXDEV);
+        };
         const auto object = [] { return quorelReport{}; };
         const std::map<std::string, std::function<int()>> calls = {
             {"track", init_ckerr_locking},
             {"untrack", [] { return exit_ckerr(), 0; }},
+            {"tracking?", ckflg_ckerr},
+            {"enter", [&] { return set_ckerr_fun(text(1)); }},
+            {"calloc", [&] { return had(calloc_ckerr(std::stoull(given), std::stoull(text(2)))); }},
+            {"malloc", [&] { return had(malloc_ckerr(std::stoull(given))); }},
+            {"freeall", [&] { return blocks_.clear(), freeall_ckerr(), 0; }},
             {"wait", [&] { return now_s += number(1), 0; }},
             {"report", [&] { return tried(init_report(file, text(2), number(3)), ckflg_report()); }},
             {"log", [&] { return tried(init_log(file, text(2), number(3))); }},
@@ -112,6 +123,7 @@ protected:
 
 private:
     test::TemporaryFolder folder_;
+    std::vector<void*> blocks_;
 };
 
 TEST_P(Session, AnswersAndWritesWhatTheScriptSays) {

@@ -23,12 +23,10 @@ extern "C" [[gnu::visibility("default")]] const char* __asan_default_options() {
 
 namespace {
 
-using test::leak_report;
 using Tracked = test::Tracking;
 
 constexpr int kCapacity = 16384;
-/** More than any address space gives, without overflowing. Volatile: compilers warn of such a request. */
-volatile std::size_t beyond_memory = std::size_t{1} << 62;
+/** Volatile: compilers warn of such a request. */
 volatile std::size_t overflowing = SIZE_MAX;
 
 TEST_F(Tracked, BlocksAreAlignedAndLeadBackToTheSystemsAddress) {
@@ -57,21 +55,6 @@ TEST_F(Tracked, CallocClearsWhatWasUsedBefore) {
     }
 }
 
-TEST_F(Tracked, SizesThatCannotBeHadGiveNull) {
-    const std::size_t half = std::size_t{1} << 32, beyond = beyond_memory, over = overflowing;
-    for (const bool tracking : {true, false}) {
-        if (!tracking) exit_ckerr();
-        for (const auto& [count, size] :
-             {std::pair{over, over}, {half, half}, {beyond, 1}, {1, beyond}, {1, over}, {1, over - 15}}) {
-            errno = 0;
-            EXPECT_EQ(calloc_ckerr(count, size), nullptr) << count << " x " << size;
-            EXPECT_EQ(std::exchange(errno, 0), ENOMEM);
-            EXPECT_TRUE(count > 1 || malloc_ckerr(size) == nullptr) << size;
-        }
-        freeall_ckerr();  // the null entries
-    }
-}
-
 // The counters have 16 bits: after 65536 calls the coordinates of a callee equal those that its caller's blocks
 // carry, and a comparison of counters would free the caller's blocks under it.
 TEST_F(Tracked, CallersBlocksSurviveTheWrapAroundOfTheCounters) {
@@ -87,15 +70,6 @@ TEST_F(Tracked, CallersBlocksSurviveTheWrapAroundOfTheCounters) {
     set_ckerr_fun("callee");
     mark();
     EXPECT_EQ(test::leak_lines(), "callee : 0\t1\t40001\t\n");
-}
-
-TEST_F(Tracked, BlocksThatAreLeftAreToldOnce) {
-    void* const block = malloc_ckerr(1);
-    EXPECT_EQ(leak_report(),
-              "\nPotential memory leaks detected!\n\n1 buffers left to be de-allocated.!\n"
-              "--------------------------------\nML call graph coordinates: \nmain() : 0\t\n");
-    EXPECT_EQ(leak_report(), "") << "a second exit has nothing to say";
-    free_ckerr(block);  // which was not freed
 }
 
 // Without tracking nothing could reclaim the parts of one that fails: the leak sanitizer looks for them.

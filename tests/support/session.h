@@ -20,11 +20,10 @@ namespace test {
  *   == title               begins a session
  *   == title for 1 2 17    begins one that runs with each of the values, which "@" stands for
  *   $ call words = result  carries out a call, whose result may be left out
- *   | line                 that the call tells, or writes to the error stream: all of them; a "\" at its end stands
- *                          for no line feed
+ *   | line                 that the call tells or writes to the error stream, and there are no others
  *   # text                 is for the reader
  *
- * Words may be quoted; "(null)" is none, and "x*17" seventeen times x. */
+ * A line that ends in "\" has no line feed. Words may be quoted; "(null)" is none, "x*17" seventeen times x. */
 
 /** The words of a call, its name first. */
 class Words {
