@@ -2,10 +2,13 @@
 #define QUO_TESTS_SIGNALLIB_ENGINES_H
 
 #include <gtest/gtest.h>
+#include <sys/resource.h>
+#include <unistd.h>
 
 #include <cerrno>
 #include <complex>
 #include <cstdlib>
+#include <fstream>
 #include <numbers>
 #include <ostream>
 #include <random>
@@ -53,8 +56,33 @@ protected:
         if (std::string{fft_engine_name()} == "none") GTEST_SKIP() << "not installed here";
     }
 
+    /** The stand-in takes the definition as it stands, so that long transforms would take minutes. */
+    const bool fast_ = *GetParam().name != 'D';
+
 private:
     Engine engine_{GetParam().choice, GetParam().mkl};
+};
+
+/** Leaves the process so many bytes of address space beyond what it has. */
+class AddressSpace {
+public:
+    explicit AddressSpace(rlim_t bytes) {
+        getrlimit(RLIMIT_AS, &before_);
+        std::ifstream pages{"/proc/self/statm"};
+        rlim_t taken = 0;
+        pages >> taken;
+        const rlimit limit{taken * static_cast<rlim_t>(sysconf(_SC_PAGESIZE)) + bytes, before_.rlim_max};
+        setrlimit(RLIMIT_AS, &limit);
+    }
+    ~AddressSpace() {
+        setrlimit(RLIMIT_AS, &before_);
+        errno = 0;
+    }
+    AddressSpace(const AddressSpace&) = delete;
+    AddressSpace& operator=(const AddressSpace&) = delete;
+
+private:
+    rlimit before_{};
 };
 
 inline Samples noise(std::size_t count, unsigned seed = 17) {
@@ -65,9 +93,18 @@ inline Samples noise(std::size_t count, unsigned seed = 17) {
     return samples;
 }
 
-/** exp(sign 2 pi i k / n), exact for any k. */
-inline dcomplex root(std::size_t k, std::size_t n, double sign = -1.0) {
-    return std::polar(1.0, sign * 2.0 * std::numbers::pi * static_cast<double>(k % n) / static_cast<double>(n));
+/** The defining sum of m bins, `w` apart from `a` on, in radians per sample and backwards. */
+inline Exact direct(const fcomplex* x, int n, int m, double w, double a) {
+    Exact out(static_cast<std::size_t>(m));
+    for (int k = 0; k < m; ++k)
+        for (int j = 0; j < n; ++j)
+            out[static_cast<std::size_t>(k)] += dcomplex{x[j]} * std::polar(1.0, -j * (a - k * w));
+    return out;
+}
+/** Every `step`-th bin of a transform. */
+inline Exact direct_dft(const Samples& x, int step = 1) {
+    const int n = static_cast<int>(x.size());
+    return direct(x.data(), n, (n - 1) / step + 1, -2.0 * std::numbers::pi * step / n, 0.0);
 }
 
 /** Root mean square of the difference, relative to that of the expected values. */

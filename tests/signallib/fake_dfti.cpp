@@ -27,7 +27,7 @@ struct Descriptor {
 };
 
 int threading_layer = -1;
-Long live = 0;
+int live = 0;
 
 bool told_to_fail(std::string_view call) {
     const char* name = std::getenv("FAKE_DFTI_FAILS");
@@ -36,50 +36,42 @@ bool told_to_fail(std::string_view call) {
 
 using Vector = std::vector<std::complex<double>>;
 
-Vector direct(const Vector& x, double sign) {
-    const std::size_t n = x.size();
-    Vector y(n);
-    for (std::size_t k = 0; k < n; ++k)
-        for (std::size_t j = 0; j < n; ++j)
-            y[k] += x[j] * std::polar(1.0, sign * 2.0 * std::numbers::pi * static_cast<double>(j * k % n) /
-                                               static_cast<double>(n));
-    return y;
-}
-
 /** Of a packed real spectrum, number k is the real or imaginary part of bin (k + 1) / 2. */
 double& packed(Vector& spectrum, std::size_t k) {
     return reinterpret_cast<double(&)[2]>(spectrum[(k + 1) / 2])[k % 2 == 1 || k == 0 ? 0 : 1];
 }
 
-/** One transform of `d`, whose samples lie `stride` apart. */
-void transform(Descriptor& d, const float* in, float* out, bool forward) {
+/** One transform of `d`, by the defining sum. */
+void transform(Descriptor& d, const float* in, float* out, double sign) {
     const auto n = static_cast<std::size_t>(d.length);
-    const Long floats = d.real ? 1 : 2;
-    Vector x(n);
+    const Long parts = d.real ? 1 : 2;
+    const bool packs = d.real && sign < 0.0, unpacks = d.real && sign > 0.0;
+    Vector x(n), y(n);
     for (std::size_t k = 0; k < n; ++k) {
-        const float* const sample = in + static_cast<Long>(k) * d.values[kInStrides] * floats;
-        if (!d.real || forward) x[k] = {sample[0], d.real ? 0.0F : sample[1]};
-        if (d.real && !forward) packed(x, k) = *sample;
+        const float* const sample = in + static_cast<Long>(k) * d.values[kInStrides] * parts;
+        if (unpacks) packed(x, k) = *sample;
+        if (!unpacks) x[k] = {sample[0], d.real ? 0.0F : sample[1]};
     }
-    if (d.real && !forward)
-        for (std::size_t k = n / 2 + 1; k < n; ++k) x[k] = std::conj(x[n - k]);
-    x = direct(x, forward ? -1.0 : 1.0);
+    for (std::size_t k = n / 2 + 1; k < n && unpacks; ++k) x[k] = std::conj(x[n - k]);
+    for (std::size_t k = 0; k < n * n; ++k)
+        y[k / n] +=
+            x[k % n] * std::polar(1.0, sign * 2.0 * std::numbers::pi * static_cast<double>(k / n * (k % n) % n) /
+                                           static_cast<double>(n));
     for (std::size_t k = 0; k < n; ++k) {
-        float* const sample = out + static_cast<Long>(k) * d.values[kOutStrides] * floats;
-        sample[0] = static_cast<float>(d.real && forward ? packed(x, k) : x[k].real());
-        if (!d.real) sample[1] = static_cast<float>(x[k].imag());
+        float* const sample = out + static_cast<Long>(k) * d.values[kOutStrides] * parts;
+        sample[0] = static_cast<float>(packs ? packed(y, k) : y[k].real());
+        if (!d.real) sample[1] = static_cast<float>(y[k].imag());
     }
 }
 
 /** The output follows the input unless both are one. */
-Long compute(void* handle, void* in, std::va_list more, bool forward) {
+Long compute(void* handle, void* in, std::va_list more, double sign) {
     auto& d = *static_cast<Descriptor*>(handle);
     if (told_to_fail("compute") || !d.committed) return kBadDescriptor;
     void* const out = d.values[kPlacement] == kNotInPlace ? va_arg(more, void*) : in;
-    const Long floats = d.real ? 1 : 2;
-    for (Long t = 0; t < d.values[kTransforms]; ++t)
-        transform(d, static_cast<const float*>(in) + t * d.values[kInDistance] * floats,
-                  static_cast<float*>(out) + t * d.values[kOutDistance] * floats, forward);
+    for (Long t = 0, parts = d.real ? 1 : 2; t < d.values[kTransforms]; ++t)
+        transform(d, static_cast<const float*>(in) + t * d.values[kInDistance] * parts,
+                  static_cast<float*>(out) + t * d.values[kOutDistance] * parts, sign);
     return kOk;
 }
 
@@ -87,7 +79,7 @@ Long compute(void* handle, void* in, std::va_list more, bool forward) {
 
 FAKE_API int MKL_Set_Threading_Layer(int layer) { return threading_layer = layer; }
 FAKE_API int fake_threading_layer() { return threading_layer; }
-FAKE_API long fake_live_descriptors() { return live; }
+FAKE_API int fake_live_descriptors() { return live; }
 
 FAKE_API Long DftiCreateDescriptor(void** handle, int precision, int domain, Long dimensions, ...) {
     std::va_list more;
@@ -97,10 +89,7 @@ FAKE_API Long DftiCreateDescriptor(void** handle, int precision, int domain, Lon
     if (precision != kSingle || (domain != kComplex && domain != kReal) || dimensions != 1 || length < 1 ||
         told_to_fail("create"))
         return kUnimplemented;
-    auto* d = new Descriptor;
-    d->real = domain == kReal;
-    d->length = length;
-    *handle = d;
+    *handle = new Descriptor{.real = domain == kReal, .length = length};
     ++live;
     return kOk;
 }
@@ -127,21 +116,16 @@ FAKE_API Long DftiCommitDescriptor(void* handle) {
     return kOk;
 }
 
-FAKE_API Long DftiComputeForward(void* handle, void* in, ...) {
-    std::va_list more;
-    va_start(more, in);
-    const Long status = compute(handle, in, more, true);
-    va_end(more);
-    return status;
-}
-
-FAKE_API Long DftiComputeBackward(void* handle, void* in, ...) {
-    std::va_list more;
-    va_start(more, in);
-    const Long status = compute(handle, in, more, false);
-    va_end(more);
-    return status;
-}
+#define FAKE_COMPUTE(name, sign)                             \
+    FAKE_API Long name(void* handle, void* in, ...) {        \
+        std::va_list more;                                   \
+        va_start(more, in);                                  \
+        const Long status = compute(handle, in, more, sign); \
+        va_end(more);                                        \
+        return status;                                       \
+    }
+FAKE_COMPUTE(DftiComputeForward, -1.0)
+FAKE_COMPUTE(DftiComputeBackward, 1.0)
 
 FAKE_API Long DftiFreeDescriptor(void** handle) {
     delete static_cast<Descriptor*>(*handle);
