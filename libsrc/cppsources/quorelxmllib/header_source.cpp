@@ -7,6 +7,7 @@
 #include <cerrno>
 
 #include "quo_base/quorelxml_v2.h"
+#include "sarutillib/ground/transfer.h"
 
 namespace quo {
 namespace {
@@ -21,21 +22,17 @@ int unread(int error) noexcept {
 }  // namespace
 
 int HeaderSource::open(const char* file) noexcept {
-    int number = -1;
-    do number = ::open(file, O_RDONLY | O_CLOEXEC);
-    while (number < 0 && errno == EINTR);
-    file_ = Descriptor{number};
+    file_ = Descriptor{retried([=] { return ::open(file, O_RDONLY | O_CLOEXEC); })};
     struct stat found {};
-    if (!file_ || ::fstat(number, &found) != 0) return unread(errno);
+    if (!file_ || ::fstat(file_.get(), &found) != 0) return unread(errno);
     if (S_ISDIR(found.st_mode)) return unread(EISDIR);
     return found.st_size > quorelxml::kMostFileBytes ? unread(EFBIG) : QUO_OK;
 }
 
 int HeaderSource::read(void* source, char* buffer, int length) noexcept {
     auto& self = *static_cast<HeaderSource*>(source);
-    ssize_t got = 0;
-    do got = ::read(self.file_.get(), buffer, static_cast<std::size_t>(length));
-    while (got < 0 && errno == EINTR);
+    const ssize_t got =
+        retried([&] { return ::read(self.file_.get(), buffer, static_cast<std::size_t>(length)); });
     if (got > 0) self.bytes_ += got;
     const int error = got < 0 ? errno : self.bytes_ > quorelxml::kMostFileBytes ? EFBIG : 0;
     if (self.error_ == 0) self.error_ = error;

@@ -17,6 +17,7 @@
 #include "quorelxmllib/xml_text.h"
 #include "sarutillib/ground/bounded_text.h"
 #include "sarutillib/ground/number_text.h"
+#include "sarutillib/ground/quoted_xml.h"
 
 using quo::CallFrame;
 using quo::guarded;
@@ -223,7 +224,7 @@ int quorelxmlPi::initXmlFile(const char* file_name, const char* stylesheet) noex
     return guarded(frame, [&] {
         const auto path = quo::xml_text(quo::text_or_empty(stylesheet));
         if (!path) return frame.fail(QUO_REFUSED, "Text cannot be stored in XML");
-        const std::string content = R"(type="text/xsl" href=")" + quo::quoted_text(*path) + '"';
+        const std::string content = R"(type="text/xsl" href=")" + quo::quoted_xml(*path) + '"';
         const int inserted = insertInstruction("xml-stylesheet", content.c_str());
         return inserted ? frame.callee(inserted) : frame.success();
     });

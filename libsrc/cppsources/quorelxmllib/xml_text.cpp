@@ -72,27 +72,4 @@ bool is_field_path(std::string_view path) {
     }
 }
 
-std::string quoted_text(std::string_view text) {
-    std::string result;
-    for (const char c : text) {
-        switch (c) {
-            case '&':
-                result += "&amp;";
-                break;
-            case '<':
-                result += "&lt;";
-                break;
-            case '>':
-                result += "&gt;";
-                break;
-            case '"':
-                result += "&quot;";
-                break;
-            default:
-                result += c;
-        }
-    }
-    return result;
-}
-
 }  // namespace quo

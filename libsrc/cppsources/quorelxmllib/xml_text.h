@@ -16,9 +16,6 @@ std::optional<std::string> xml_text(std::string_view text);
  * when they are nested. */
 bool is_field_path(std::string_view path);
 
-/** `text` between the double quotes of a processing instruction's pseudo-attribute. */
-std::string quoted_text(std::string_view text);
-
 }  // namespace quo
 
 #endif

@@ -5,6 +5,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <type_traits>
 #include <utility>
 
 #include "datafilelib/raster_region.h"
@@ -368,12 +369,12 @@ void BufferFile::writeBlock(const void* src, int memory_type, int first_line, in
     dropBuffer(*next);
 }
 
-#define QUO_BLOCKS_OF(T, cell_type)                                                            \
-    void BufferFile::readbuffer(T* dst, int line, int lines, int sample, int samples) {        \
-        readBlock(dst, cell_type, line, lines, sample, samples);                               \
-    }                                                                                          \
-    void BufferFile::writebuffer(const T* src, int line, int lines, int sample, int samples) { \
-        writeBlock(src, cell_type, line, lines, sample, samples);                              \
+#define QUO_BLOCKS_OF(T, cell_type)                                                                        \
+    void BufferFile::readbuffer(std::add_pointer_t<T> dst, int line, int lines, int sample, int samples) { \
+        readBlock(dst, cell_type, line, lines, sample, samples);                                           \
+    }                                                                                                      \
+    void BufferFile::writebuffer(const T* src, int line, int lines, int sample, int samples) {             \
+        writeBlock(src, cell_type, line, lines, sample, samples);                                          \
     }
 QUO_BLOCKS_OF(float, FLOAT32)
 QUO_BLOCKS_OF(double, FLOAT64)

@@ -5,6 +5,7 @@
 #include <limits>
 #include <string>
 #include <string_view>
+#include <type_traits>
 
 #include "diagnosticslib/call_frame.h"
 #include "profilelib/out_of_memory.h"
@@ -237,11 +238,11 @@ extern "C" int GetMyProfileStringArray(const char* section, const char* key, cha
     return quo::read_strings(access, strings, count, room);
 }
 
-#define QUO_READS_LIST(name, Number)                                                     \
-    extern "C" int name(const char* section, const char* key, Number* values, int count, \
-                        const char* file) noexcept {                                     \
-        Access access{#name, section, key, file};                                        \
-        return quo::read_list(access, values, count);                                    \
+#define QUO_READS_LIST(name, Number)                                                                        \
+    extern "C" int name(const char* section, const char* key, std::add_pointer_t<Number> values, int count, \
+                        const char* file) noexcept {                                                        \
+        Access access{#name, section, key, file};                                                           \
+        return quo::read_list(access, values, count);                                                       \
     }
 QUO_READS_LIST(GetMyProfileIntArray, int)
 QUO_READS_LIST(GetMyProfileInt64Array, int64_t)

@@ -1,6 +1,7 @@
 #include <cinttypes>
 #include <cstdio>
 #include <cstdlib>
+#include <type_traits>
 
 #include "quo_base/profile.h"
 #include "sarutillib/ground/bounded_text.h"
@@ -49,10 +50,10 @@ extern "C" void GetCheckMyProfileStringArray(const char* section, const char* ke
 }
 
 // Four messages name another function: they are kept as users have known them.
-#define QUO_CHECKS_LIST(name, plain, Number, named)                                                     \
-    extern "C" void name(const char* section, const char* key, Number* values, int count,               \
-                         const char* file) noexcept {                                                   \
-        if (plain(section, key, values, count, file) != 0) end_failed_check(named, section, key, file); \
+#define QUO_CHECKS_LIST(name, plain, Number, named)                                                          \
+    extern "C" void name(const char* section, const char* key, std::add_pointer_t<Number> values, int count, \
+                         const char* file) noexcept {                                                        \
+        if (plain(section, key, values, count, file) != 0) end_failed_check(named, section, key, file);      \
     }
 QUO_CHECKS_LIST(GetCheckMyProfileIntArray, GetMyProfileIntArray, int, "GetMyProfileIntArray")
 QUO_CHECKS_LIST(GetCheckMyProfileInt64Array, GetMyProfileInt64Array, int64_t, "GetMyProfileInt64Array")
@@ -100,8 +101,8 @@ extern "C" int SetParString(const char* file, const char* key, int /*count*/, co
 }
 
 #define QUO_PAR_LIST(Get, Set, Number, read, write)                                                         \
-    extern "C" int Get(const char* file, const char* key, int count, Number* values, int /*ignored*/,       \
-                       const char* section) noexcept {                                                      \
+    extern "C" int Get(const char* file, const char* key, int count, std::add_pointer_t<Number> values,     \
+                       int /*ignored*/, const char* section) noexcept {                                     \
         return read(section, key, values, count, file);                                                     \
     }                                                                                                       \
     extern "C" int Set(const char* file, const char* key, int count, const Number* values, int /*ignored*/, \

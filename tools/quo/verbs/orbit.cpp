@@ -95,8 +95,8 @@ Facts facts_of(Scene& scene, const std::vector<std::string>& findings) {
     facts.add("wavelength", "wavelength_m", wavelength_m ? exact(*wavelength_m) + " m" : "not in the header",
               wavelength_m ? Json(*wavelength_m) : Json());
     facts.add("look side", "look_side", side ? side : "not in the header", side ? Json(side) : Json());
-    facts.add("model error", "model_error_m", fixed(orbit.orbitFitError() * 1e3, 4) + " mm (estimate)",
-              orbit.orbitFitError());
+    const double error_m = orbit.orbitFitError();
+    facts.add("model error", "model_error_m", fixed(error_m * 1e3, 4) + " mm (estimate)", error_m);
     if (findings.empty()) facts.add("findings", nullptr, "none", {});
     for (const std::string& finding : findings) facts.add("finding", nullptr, finding, {});
     facts.add(nullptr, "findings", "", findings);

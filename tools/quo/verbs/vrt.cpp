@@ -5,6 +5,7 @@
 #include "commands.h"
 #include "output.h"
 #include "raster.h"
+#include "sarutillib/ground/quoted_xml.h"
 
 namespace tool {
 namespace {
@@ -12,29 +13,6 @@ namespace {
 // GDAL's names of the cell types; it does not know complex samples of 8 bits.
 constexpr std::array<std::string_view, 10> kGdalTypes{"CFloat32", "Float32", "CFloat64", "Float64", "CInt32",
                                                       "Int32",    "CInt16",  "Int16",    "",        "Byte"};
-
-std::string escaped(std::string_view text) {
-    std::string out;
-    for (const char c : text) {
-        switch (c) {
-            case '&':
-                out += "&amp;";
-                break;
-            case '<':
-                out += "&lt;";
-                break;
-            case '>':
-                out += "&gt;";
-                break;
-            case '"':
-                out += "&quot;";
-                break;
-            default:
-                out += c;
-        }
-    }
-    return out;
-}
 
 std::string element(const char* name, const std::string& content) {
     return std::string{"    <"} + name + ">" + content + "</" + name + ">\n";
@@ -51,7 +29,7 @@ std::string vrt_text(const DataFile& raster, const std::string& name) {
     if (raster.CellType == INT8) {
         text += "    <Metadata domain=\"IMAGE_STRUCTURE\"><MDI key=\"PIXELTYPE\">SIGNEDBYTE</MDI></Metadata>\n";
     }
-    text += "    <SourceFilename relativeToVRT=\"1\">" + escaped(name) + "</SourceFilename>\n";
+    text += "    <SourceFilename relativeToVRT=\"1\">" + quo::quoted_xml(name) + "</SourceFilename>\n";
     text += element("ImageOffset", std::to_string(raster.HeaderOffset + raster.RowPrefix));
     text += element("PixelOffset", std::to_string(size));
     text += element("LineOffset", std::to_string(line));

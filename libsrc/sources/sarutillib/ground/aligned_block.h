@@ -10,8 +10,8 @@
 
 namespace quo {
 
-/** Alignment of the blocks that callers get. Each stands at the first multiple of it strictly above the address that
- * the system gave, and the pointer-sized word just below the block holds that address. */
+/** Alignment of the blocks that callers get. Each stands at the first multiple of it strictly above the address
+ * that the system gave, and the pointer-sized word just below the block holds that address. */
 inline constexpr std::size_t kBlockAlignment = 16;
 
 /** What is asked of the system for `count` elements; nothing where that is more than memory can have. */
