@@ -96,7 +96,13 @@ function(quo_test name)
     target_compile_definitions(${target} PRIVATE QUO_TEST_DATA="${PROJECT_SOURCE_DIR}/tests/data")
     quo_link_components(${target} ${arg_COMPONENTS})
     target_link_libraries(${target} PRIVATE ${arg_LINK} GTest::gmock GTest::gtest_main)
-    gtest_discover_tests(${target} TEST_PREFIX "${name}." DISCOVERY_TIMEOUT 120 PROPERTIES TIMEOUT 300)
+    # Memory that is not there is a refusal, also where the sanitizers hand it out.
+    gtest_discover_tests(
+        ${target}
+        TEST_PREFIX "${name}."
+        DISCOVERY_TIMEOUT 120
+        PROPERTIES TIMEOUT 300 ENVIRONMENT ASAN_OPTIONS=allocator_may_return_null=1
+    )
 endfunction()
 
 # quo_bench(name SOURCES ... COMPONENTS component ... [LINK library ...]): one benchmark program.

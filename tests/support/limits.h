@@ -36,19 +36,19 @@ private:
 class OrdinaryUser {
 public:
     OrdinaryUser() : before_{geteuid()} {
-        if (before_ == 0 && seteuid(65534) != 0) throw std::runtime_error("cannot give up rights");
-        // Nor may a child of such a user be traced, as looking for its leaks would.
-        setenv("LSAN_OPTIONS", "detect_leaks=0", 1);
+        // A child that is this user in all respects may look into itself, as the search for leaks does.
+        if (before_ == 0 && setresuid(kNobody, kNobody, before_) != 0)
+            throw std::runtime_error("cannot give up rights");
     }
     ~OrdinaryUser() {
-        if (seteuid(before_) != 0) std::abort();
-        unsetenv("LSAN_OPTIONS");
+        if (before_ == 0 && setresuid(before_, before_, before_) != 0) std::abort();
         errno = 0;
     }
     OrdinaryUser(const OrdinaryUser&) = delete;
     OrdinaryUser& operator=(const OrdinaryUser&) = delete;
 
 private:
+    static constexpr uid_t kNobody = 65534;
     uid_t before_;
 };
 
