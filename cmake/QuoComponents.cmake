@@ -9,6 +9,7 @@ target_compile_options(quo_flags INTERFACE
     # Results must not hang on which operations the compiler chose to fuse.
     -ffp-contract=off)
 target_compile_definitions(quo_flags INTERFACE _FILE_OFFSET_BITS=64)
+# Optimising the tests themselves takes longer than running them as they are.
 set(quo_test_level -O1)
 if(QUO_SANITIZE)
     set(quo_test_level -O0)
@@ -84,14 +85,27 @@ function(quo_link_components target)
     target_link_libraries(${target} PRIVATE quo_flags)
 endfunction()
 
+# What every test includes is compiled once, by a program that is none.
+function(quo_test_headers)
+    if(NOT TARGET quo_test_headers)
+        file(CONFIGURE OUTPUT "${PROJECT_BINARY_DIR}/no_test.cpp" CONTENT "int main() {}\n")
+        add_executable(quo_test_headers "${PROJECT_BINARY_DIR}/no_test.cpp")
+        target_compile_options(quo_test_headers PRIVATE ${quo_test_level} -Wno-array-bounds)
+        target_link_libraries(quo_test_headers PRIVATE quo_flags GTest::gmock)
+        target_precompile_headers(quo_test_headers PRIVATE <gmock/gmock.h> <filesystem> <fstream>)
+    endif()
+endfunction()
+
 # quo_test(name SOURCES ... COMPONENTS component ... [LINK library ...]): one test program; ctest runs every case in a
 # process of its own, because the report, the frames and the profile cache are process-wide.
 function(quo_test name)
     cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "SOURCES;COMPONENTS;LINK")
     set(target ${name}_test)
     add_executable(${target} ${arg_SOURCES})
-    # Optimising the tests themselves takes longer than running them as they are.
-    set_property(SOURCE ${arg_SOURCES} APPEND PROPERTY COMPILE_OPTIONS ${quo_test_level})
+    # The compiler forgets of precompiled headers that they are the system's, and warns of what it finds in them.
+    target_compile_options(${target} PRIVATE ${quo_test_level} -Wno-array-bounds)
+    quo_test_headers()
+    target_precompile_headers(${target} REUSE_FROM quo_test_headers)
     target_include_directories(${target} PRIVATE "${PROJECT_SOURCE_DIR}/tests")
     target_compile_definitions(${target} PRIVATE QUO_TEST_DATA="${PROJECT_SOURCE_DIR}/tests/data")
     quo_link_components(${target} ${arg_COMPONENTS})
