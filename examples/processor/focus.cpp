@@ -3,8 +3,12 @@
 #include <algorithm>
 #include <cstdint>
 #include <filesystem>
+#include <memory>
 #include <optional>
+#include <utility>
+#include <vector>
 
+#include "../common/blocks.h"
 #include "azimuth_focusing.h"
 #include "quo_base/debugIO.h"
 #include "quo_base/generalSAR.h"
@@ -51,12 +55,12 @@ private:
     void create(DataFile& raster, const std::string& name, int lines, int samples);
     void finish(DataFile& raster);
     void compress_range();
-    void read_raw(Block& block, int first, int lines);
     void focus_azimuth();
-    void focus_strip(AzimuthFocusing& focusing, int strip_line);
-    void read_block(Block& block, int first_line, int first_sample);
     void write_block(Block& block, int line, int sample);
     void write_header();
+
+    class RangeWorker;
+    class AzimuthWorker;
 
     FocusJob job_;
     const AzimuthConf& conf_;
@@ -113,13 +117,53 @@ void Processor::finish(DataFile& raster) {
                     [&] { require(raster.close(), std::string{raster.FileName} + ": cannot be written"); });
 }
 
-void Processor::read_raw(Block& block, int first, int lines) {
-    for (int line = 0; line < lines; ++line) {
-        fcomplex* samples = block.line(line);
-        product_.bufferFile.readbuffer(samples, first + line, 1, 0, 0);
-        std::fill(samples + product_.roi.Roi.Samples, samples + block.samples(), fcomplex{});
+/** Lines, or a block of the image, by the place of its first sample; and what a thread has made of them. */
+struct Piece {
+    int line, sample;
+};
+struct Done {
+    Piece piece;
+    Block* block;
+    Stopwatch stopwatch;
+};
+
+/** What a thread compresses raw lines with. */
+class Processor::RangeWorker {
+public:
+    RangeWorker(const Processor& processor, int lines)
+        : processor_{processor},
+          lines_{lines},
+          compression_{processor.product_.pulse, processor.conf_, processor.product_.roi.Roi.Samples, lines} {
+        raw_.copyDescription(processor.product_.bufferFile);
+        raw_.setFilename(processor.job_.raw.c_str());
+        raw_.open(BufferFile::READ);
     }
-}
+    [[nodiscard]] const RangeCompression& compression() const { return compression_; }
+
+    Done compress(const Piece& piece) {
+        Stopwatch stopwatch;
+        const int count = std::min(lines_, processor_.product_.roi.Roi.Lines - piece.line);
+        stopwatch.time(kReading, [&] { read(piece.line, count); });
+        compression_.compress(stopwatch);
+        return {piece, &compression_.block(), stopwatch};
+    }
+
+private:
+    void read(int first, int lines) {
+        Block& block = compression_.block();
+        const int count = processor_.product_.roi.Roi.Samples;
+        for (int line = 0; line < lines; ++line) {
+            fcomplex* samples = block.line(line);
+            raw_.readbuffer(samples, first + line, 1, 0, 0);
+            std::fill(samples + count, samples + block.samples(), fcomplex{});
+        }
+    }
+
+    const Processor& processor_;
+    int lines_;
+    BufferFile raw_;
+    RangeCompression compression_;
+};
 
 /** Compresses the raw lines into the intermediate raster. */
 void Processor::compress_range() {
@@ -127,42 +171,101 @@ void Processor::compress_range() {
     const std::int64_t block_size = std::int64_t{conf_.LinesInBlock} * conf_.SamplesInBlock;
     const int block_lines = static_cast<int>(std::clamp<std::int64_t>(block_size / raw_samples, 1, lines));
     check_memory(block_lines, raw_samples);
-    std::optional<RangeCompression> compression;
-    stopwatch_.time(kPlanning, [&] { compression.emplace(product_.pulse, conf_, raw_samples, block_lines); });
+    std::vector<std::unique_ptr<RangeWorker>> workers;
+    stopwatch_.time(kPlanning, [&] {
+        for (int i = 0; i < job_.threads; ++i)
+            workers.push_back(std::make_unique<RangeWorker>(*this, block_lines));
+    });
 
+    const RangeCompression& compression = workers.front()->compression();
     data_.SetSlowAxe(product_.roi.Roi.SlowStartTime, 1.0 / band_.prf_hz, lines);
-    data_.SetFastAxe(product_.roi.Roi.FastStartTime + compression->delay_s(), product_.roi.Roi.FastTimeDelta,
-                     compression->samples());
+    data_.SetFastAxe(product_.roi.Roi.FastStartTime + compression.delay_s(), product_.roi.Roi.FastTimeDelta,
+                     compression.samples());
     create(compressed_, compressed_raster(job_), lines, data_.Samples);
-    product_.bufferFile.open(BufferFile::READ);
-    for (int first = 0; first < lines; first += block_lines) {
-        const int count = std::min(block_lines, lines - first);
-        stopwatch_.time(kReading, [&] { read_raw(compression->block(), first, count); });
-        compression->compress(stopwatch_);
+    int line = 0;
+    const auto next = [&]() -> std::optional<Piece> {
+        if (line >= lines) return std::nullopt;
+        return Piece{std::exchange(line, line + block_lines), 0};
+    };
+    const auto write = [&](const Done& done) {
+        stopwatch_.add(done.stopwatch);
+        const int first = done.piece.line;
         stopwatch_.time(kWriting, [&] {
-            BufferIO region{&compressed_, 0, data_.Samples, first, count, FLOAT_COMPLEX};
-            require(region.writebuffer(reinterpret_cast<const char*>(compression->block().data()),
-                                       compression->block().samples()),
+            BufferIO region{&compressed_, 0, data_.Samples, first, std::min(block_lines, lines - first),
+                            FLOAT_COMPLEX};
+            require(region.writebuffer(reinterpret_cast<const char*>(done.block->data()), done.block->samples()),
                     std::string{compressed_.FileName} + ": cannot be written");
         });
         progress_.show(kRangeShare * first / lines);
-    }
-    product_.bufferFile.close();
+    };
+    auto worker = workers.begin();
+    blocks::in_order(
+        job_.threads, next,
+        [&] { return [own = (worker++)->get()](const Piece& piece) { return own->compress(piece); }; }, write);
     finish(compressed_);
 }
 
-/** Reads what the raster has of a block; beyond its borders there are zeros. */
-void Processor::read_block(Block& block, int first_line, int first_sample) {
-    const int top = std::max(0, first_line), left = std::max(0, first_sample);
-    const int bottom = std::min(data_.Lines, first_line + block.lines());
-    const int right = std::min(data_.Samples, first_sample + block.samples());
-    if (bottom - top < block.lines() || right - left < block.samples())
-        std::fill_n(block.data(), block.size(), fcomplex{});
-    BufferIO region{&compressed_, left, right - left, top, bottom - top, FLOAT_COMPLEX};
-    fcomplex* corner = block.line(top - first_line) + (left - first_sample);
-    require(region.readbuffer(reinterpret_cast<char*>(corner), block.samples()),
-            std::string{compressed_.FileName} + ": cannot be read");
-}
+/** What a thread focuses blocks with. Its orbit is as freshly read for every block, whoever had the one before. */
+class Processor::AzimuthWorker {
+public:
+    explicit AzimuthWorker(const Processor& processor)
+        : processor_{processor}, focusing_{processor.layout_, processor.band_, processor.data_.FastTimeDelta} {
+        const std::string header = processor.job_.raw + ".hdr", raster = compressed_raster(processor.job_);
+        require(product_.GSread(header.c_str()), header + ": cannot be read");
+        compressed_.copyDescription(processor.compressed_);
+        require(compressed_.setFilename(raster.c_str()), raster);
+        require(compressed_.open(0), raster + ": cannot be read");
+    }
+
+    Done focus(const Piece& piece) {
+        Stopwatch stopwatch;
+        const BlockLayout& layout = processor_.layout_;
+        const ROI_Obj& data = processor_.data_;
+        const int line = layout.first_line + piece.line;  // counted like raw lines
+        const int first_sample = piece.sample - layout.guard_samples;
+        if (piece.line != strip_line_) begin_strip(piece.line, line);
+        stopwatch.time(kReading, [&] { read(line + layout.lead_lines, first_sample); });
+        require(product_.orbit.computeApproximateSV(), "the orbit");
+        focusing_.focus(product_, *histories_, data.FastStartTime + first_sample * data.FastTimeDelta,
+                        strip_.SlowStartTime + 0.5 * strip_.SlowTimeLength, stopwatch);
+        return {piece, &focusing_.block(), stopwatch};
+    }
+
+private:
+    void begin_strip(int strip_line, int line) {
+        const BlockLayout& layout = processor_.layout_;
+        const ROI_Obj& data = processor_.data_;
+        strip_line_ = strip_line;
+        data.clone(&strip_);
+        strip_.SetSlowAxe(data.SlowStartTime + line * data.SlowTimeDelta, data.SlowTimeDelta,
+                          std::min(layout.step_lines, layout.lines - strip_line));
+        require(product_.orbit.computeApproximateSV(), "the orbit");
+        histories_.emplace(product_, strip_, processor_.job_.height_m);
+    }
+
+    /** Reads what the raster has of a block; beyond its borders there are zeros. */
+    void read(int first_line, int first_sample) {
+        Block& block = focusing_.block();
+        const ROI_Obj& data = processor_.data_;
+        const int top = std::max(0, first_line), left = std::max(0, first_sample);
+        const int bottom = std::min(data.Lines, first_line + block.lines());
+        const int right = std::min(data.Samples, first_sample + block.samples());
+        if (bottom - top < block.lines() || right - left < block.samples())
+            std::fill_n(block.data(), block.size(), fcomplex{});
+        BufferIO region{&compressed_, left, right - left, top, bottom - top, FLOAT_COMPLEX};
+        fcomplex* corner = block.line(top - first_line) + (left - first_sample);
+        require(region.readbuffer(reinterpret_cast<char*>(corner), block.samples()),
+                std::string{compressed_.FileName} + ": cannot be read");
+    }
+
+    const Processor& processor_;
+    AzimuthFocusing focusing_;
+    GeneralSAR product_;
+    DataFile compressed_;
+    int strip_line_ = -1;
+    ROI_Obj strip_;
+    std::optional<RangeHistories> histories_;
+};
 
 /** Writes the image lines of a block. The transforms are cyclic: the image line that would stand before the block
  * stands at its end. */
@@ -180,35 +283,34 @@ void Processor::write_block(Block& block, int line, int sample) {
     }
 }
 
-/** Focuses the blocks of one strip of image lines, from near to far. */
-void Processor::focus_strip(AzimuthFocusing& focusing, int strip_line) {
-    const int line = layout_.first_line + strip_line;  // counted like raw lines
-    ROI_Obj strip;
-    data_.clone(&strip);
-    strip.SetSlowAxe(data_.SlowStartTime + line * data_.SlowTimeDelta, data_.SlowTimeDelta,
-                     std::min(layout_.step_lines, layout_.lines - strip_line));
-    RangeHistories histories{product_, strip, job_.height_m};
-    for (int sample = 0; sample < layout_.samples; sample += layout_.step_samples) {
-        const int first_sample = sample - layout_.guard_samples;
-        stopwatch_.time(kReading, [&] { read_block(focusing.block(), line + layout_.lead_lines, first_sample); });
-        focusing.focus(product_, histories, data_.FastStartTime + first_sample * data_.FastTimeDelta,
-                       strip.SlowStartTime + 0.5 * strip.SlowTimeLength, stopwatch_);
-        stopwatch_.time(kWriting, [&] { write_block(focusing.block(), strip_line, sample); });
-        const double strips = (strip_line + layout_.step_lines * static_cast<double>(sample) / layout_.samples);
-        progress_.show(kRangeShare + (1.0 - kRangeShare) * strips / layout_.lines);
-    }
-}
-
-/** Focuses the intermediate raster into the image. */
+/** Focuses the intermediate raster into the image: strip by strip of image lines, each from near to far. */
 void Processor::focus_azimuth() {
     layout_ = lay_out(product_, conf_, data_, band_, job_.height_m);
     check_memory(layout_.block_lines, layout_.block_samples);
-    std::optional<AzimuthFocusing> focusing;
-    stopwatch_.time(kPlanning, [&] { focusing.emplace(layout_, band_, data_.FastTimeDelta); });
+    std::vector<std::unique_ptr<AzimuthWorker>> workers;
+    stopwatch_.time(kPlanning, [&] {
+        for (int i = 0; i < job_.threads; ++i) workers.push_back(std::make_unique<AzimuthWorker>(*this));
+    });
     create(image_, job_.image, layout_.lines, layout_.samples);
-    require(compressed_.open(0), std::string{compressed_.FileName} + ": cannot be read");
-    for (int line = 0; line < layout_.lines; line += layout_.step_lines) focus_strip(*focusing, line);
-    require(compressed_.close(), std::string{compressed_.FileName} + ": cannot be closed");
+    Piece piece{0, 0};
+    const auto next = [&]() -> std::optional<Piece> {
+        if (piece.line >= layout_.lines) return std::nullopt;
+        const Piece present = piece;
+        piece.sample += layout_.step_samples;
+        if (piece.sample >= layout_.samples) piece = {piece.line + layout_.step_lines, 0};
+        return present;
+    };
+    const auto write = [&](const Done& done) {
+        stopwatch_.add(done.stopwatch);
+        stopwatch_.time(kWriting, [&] { write_block(*done.block, done.piece.line, done.piece.sample); });
+        const double strips =
+            done.piece.line + layout_.step_lines * static_cast<double>(done.piece.sample) / layout_.samples;
+        progress_.show(kRangeShare + (1.0 - kRangeShare) * strips / layout_.lines);
+    };
+    auto worker = workers.begin();
+    blocks::in_order(
+        job_.threads, next, [&] { return [own = (worker++)->get()](const Piece& at) { return own->focus(at); }; },
+        write);
     finish(image_);
     if (processing_.EraseTemp != 0)
         stopwatch_.time(kWriting, [&] { std::filesystem::remove(compressed_.FileName); });

@@ -14,6 +14,7 @@ struct FocusJob {
     std::string image;      // raster to make, with the header "<image>.hdr"
     double height_m = 0.0;  // of the scene above the ellipsoid, on average
     bool waitbar = false;
+    int threads = 1;  // that work on blocks; each takes a block's memory
 };
 
 /** What was made, and what the time went into. */

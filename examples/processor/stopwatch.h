@@ -21,6 +21,10 @@ public:
         piece();
         seconds_[work] += since(start);
     }
+    /** Adds what another watch has counted, such as that of a thread. */
+    void add(const Stopwatch& other) {
+        for (std::size_t work = 0; work < kWorks; ++work) seconds_[work] += other.seconds_[work];
+    }
     [[nodiscard]] double seconds(std::size_t work) const { return seconds_[work]; }
     /** Since the object was made. */
     [[nodiscard]] double total() const { return since(start_); }

@@ -74,6 +74,10 @@ void Scene::take_orbit(GeneralSAR& product) {
     if (!product.GSexists(gsOrbit)) throw Failure(name_ + ": cannot be read");
 }
 
+void require_solved(int status) {
+    if (status != QUO_OK) throw Failure("status " + status_text(status));
+}
+
 std::string uneven_vectors(const GeneralSAROrbit& orbit) {
     std::vector<SVFinding> findings;
     std::string causes;

@@ -12,6 +12,9 @@ class GeneralSAR;
 
 namespace tool {
 
+/** Throws Failure where an orbit could not do what it was asked for as a whole. */
+void require_solved(int status);
+
 /** What keeps state vectors from standing one spacing apart: gaps, duplicates, vectors out of order, in words.
  * Every time behind such a place would be wrong. Empty where they do. */
 std::string uneven_vectors(const GeneralSAROrbit& orbit);

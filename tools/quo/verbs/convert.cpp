@@ -1,6 +1,9 @@
 #include <algorithm>
 #include <complex>
-#include <type_traits>
+#include <memory>
+#include <optional>
+#include <variant>
+#include <vector>
 
 #include "apart.h"
 #include "commands.h"
@@ -14,6 +17,7 @@ namespace {
 struct ConvertOptions {
     std::string in, out, type, order, lines = ":", samples = ":", prefix = "keep", scale = "1", offset = "0";
     bool waitbar = false;
+    int threads = 0;
 };
 
 /** The description of the raster that the options ask for. */
@@ -58,11 +62,70 @@ private:
     double scale_, offset_;
 };
 
+/** Samples of a tile in the type that they are written from. */
+using Samples =
+    std::variant<std::vector<float>, std::vector<double>, std::vector<fcomplex>, std::vector<dcomplex>>;
+
+struct Converted {
+    Tile tile;
+    Samples samples;
+};
+
+/** What a thread needs to read tiles and bring their samples to what is written. */
+class TileReader {
+public:
+    TileReader(const std::string& name, const RasterDescription& in, const RasterDescription& wanted,
+               const Scaling& scaling, Cut lines, Cut samples)
+        : in_{name, in}, wanted_{wanted}, scaling_{scaling}, lines_{lines}, samples_{samples} {}
+
+    Converted read(const Tile& tile) {
+        const bool complex = wanted_.is_complex() != 0;
+        if (scaling_.changes()) {
+            if (complex) return {tile, scaled<dcomplex>(tile)};
+            return {tile, in_written_type(scaled<double>(tile))};
+        }
+        if (wanted_.CellType == FLOAT_COMPLEX) return {tile, samples<fcomplex>(tile)};
+        if (complex) return {tile, samples<dcomplex>(tile)};
+        if (wanted_.CellType == FLOAT32) return {tile, samples<float>(tile)};
+        return {tile, samples<double>(tile)};
+    }
+
+private:
+    template <typename T>
+    std::vector<T> samples(Tile tile) {
+        std::vector<T> values(tile.size());
+        tile.first_line += lines_.first;
+        tile.first_sample += samples_.first;
+        in_.read(tile, values.data());
+        return values;
+    }
+    // In double precision, whatever the two types.
+    template <typename T>
+    std::vector<T> scaled(const Tile& tile) {
+        std::vector<T> values = samples<T>(tile);
+        scaling_.apply(values);
+        return values;
+    }
+    // FLOAT32 is written from its own type.
+    [[nodiscard]] Samples in_written_type(std::vector<double> values) const {
+        if (wanted_.CellType != FLOAT32) return values;
+        std::vector<float> singles(values.size());
+        std::ranges::transform(values, singles.begin(), [](double value) { return static_cast<float>(value); });
+        return singles;
+    }
+
+    RasterReader in_;
+    const RasterDescription& wanted_;
+    const Scaling& scaling_;
+    Cut lines_, samples_;
+};
+
 /** The part of a raster that is copied, tile by tile. */
 class Conversion {
 public:
     Conversion(const ConvertOptions& options, const RasterDescription& description)
-        : lines_{cut_of(options.lines, description.NrOfLinesPerImage, "--lines")},
+        : options_{options},
+          lines_{cut_of(options.lines, description.NrOfLinesPerImage, "--lines")},
           samples_{cut_of(options.samples, description.NrOfPixelsPerLine, "--samples")},
           wanted_{options, description, lines_, samples_},
           scaling_{options},
@@ -71,62 +134,39 @@ public:
         if (!scaling_.changes() && holds_every_value(wanted_, description)) out_.expect_no_losses();
     }
 
-    void run(bool waitbar) {
-        {
-            Progress progress{waitbar ? "Converting" : nullptr};
-            for_each_tile(lines_.count(), samples_.count(), 1, [&](const Tile& tile) {
-                throw_if_interrupted();
-                copy(tile);
-                progress.step(
-                    sample_offset(wanted_, tile.first_line + tile.lines - 1, tile.first_sample + tile.samples),
-                    wanted_.rasterSize());
-            });
-        }
+    void run() {
+        copy_tiles();
         out_.commit();
     }
 
 private:
-    void copy(const Tile& tile) {
-        if (tile.first_sample == 0) {
-            for (int line = 0; line < tile.lines; ++line) copy_prefix(tile.first_line + line);
-        }
-        if (scaling_.changes()) {
-            wanted_.is_complex() != 0 ? scale_samples(tile, doubles_) : scale_samples(tile, real_doubles_);
-        } else if (wanted_.CellType == FLOAT_COMPLEX) {
-            copy_samples(tile, singles_);
-        } else if (wanted_.is_complex() != 0) {
-            copy_samples(tile, doubles_);
-        } else if (wanted_.CellType == FLOAT32) {
-            copy_samples(tile, real_singles_);
-        } else {
-            copy_samples(tile, real_doubles_);
-        }
+    void copy_tiles() {
+        Progress progress{options_.waitbar ? "Converting" : nullptr};
+        std::vector<Tile> tiles;
+        for_each_tile(lines_.count(), samples_.count(), 1, [&](const Tile& tile) { tiles.push_back(tile); });
+        auto tile = tiles.cbegin();
+        const auto next = [&]() -> std::optional<Tile> {
+            throw_if_interrupted();
+            if (tile == tiles.cend()) return std::nullopt;
+            return *tile++;
+        };
+        const auto make_worker = [&] {
+            return [own = std::make_unique<TileReader>(options_.in, in_.description(), wanted_, scaling_, lines_,
+                                                       samples_)](const Tile& part) { return own->read(part); };
+        };
+        blocks::in_order(options_.threads, next, make_worker, [&](const Converted& part) {
+            write(part);
+            progress.step(sample_offset(wanted_, part.tile.first_line + part.tile.lines - 1,
+                                        part.tile.first_sample + part.tile.samples),
+                          wanted_.rasterSize());
+        });
     }
 
-    template <typename T>
-    void read_samples(const Tile& tile, std::vector<T>& room) {
-        room.resize(tile.size());
-        Tile from = tile;
-        from.first_line += lines_.first;
-        from.first_sample += samples_.first;
-        in_.read(from, room.data());
-    }
-    template <typename T>
-    void copy_samples(const Tile& tile, std::vector<T>& room) {
-        read_samples(tile, room);
-        out_.write(tile, room.data());
-    }
-    // In double precision, whatever the two types.
-    template <typename T>
-    void scale_samples(const Tile& tile, std::vector<T>& room) {
-        read_samples(tile, room);
-        scaling_.apply(room);
-        if (wanted_.CellType != FLOAT32) return out_.write(tile, room.data());
-        if constexpr (std::is_same_v<T, double>) {  // FLOAT32 is written from its own type
-            real_singles_.resize(room.size());
-            std::ranges::transform(room, real_singles_.begin(), [](T value) { return static_cast<float>(value); });
-            out_.write(tile, real_singles_.data());
+    void write(const Converted& part) {
+        if (part.tile.first_sample == 0) {
+            for (int line = 0; line < part.tile.lines; ++line) copy_prefix(part.tile.first_line + line);
         }
+        std::visit([&](const auto& samples) { out_.write(part.tile, samples.data()); }, part.samples);
     }
 
     void copy_prefix(int line) {
@@ -143,16 +183,12 @@ private:
 
     static constexpr std::int64_t kPiece = 1 << 20;
 
+    const ConvertOptions& options_;
     Cut lines_, samples_;
     Wanted wanted_;
     Scaling scaling_;
-    RasterReader in_;
+    RasterReader in_;  // for the lines' prefixes
     NewRaster out_;
-    // One of them holds the samples of a tile.
-    std::vector<float> real_singles_;
-    std::vector<double> real_doubles_;
-    std::vector<fcomplex> singles_;
-    std::vector<dcomplex> doubles_;
     std::vector<char> prefix_;
 };
 
@@ -161,7 +197,7 @@ int convert(const ConvertOptions& options) {
     DataFile description;
     read_description(options.in, description);
     note_interrupts();
-    Conversion{options, description}.run(options.waitbar);
+    Conversion{options, description}.run();
     return kFine;
 }
 
@@ -182,6 +218,7 @@ void add_convert(CLI::App& app, Job& job) {
     command->add_option("--scale", options.scale, "Factor for every sample (1), before --offset");
     command->add_option("--offset", options.offset, "What is added to every sample (0)");
     add_waitbar_option(*command, options.waitbar);
+    add_threads_option(*command, options.threads);
 }
 
 }  // namespace tool

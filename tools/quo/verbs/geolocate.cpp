@@ -61,10 +61,6 @@ struct Direction {
 
 constexpr Input kDoppler{"doppler_hz"}, kHeight{"height_m"};
 
-void require_solved(int status) {
-    if (status != QUO_OK) throw Failure("status " + status_text(status));
-}
-
 void to_ground(const Scene& scene, GeneralSAROrbit& /*own*/, Points& points) {
     auto& [x, y, z, latitude, longitude, incidence, look, fm_rate, speed] = points.out;
     const auto& [time_s, range_s, unused] = points.in;

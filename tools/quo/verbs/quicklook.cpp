@@ -2,6 +2,9 @@
 #include <cmath>
 #include <complex>
 #include <limits>
+#include <memory>
+#include <optional>
+#include <span>
 
 #include "apart.h"
 #include "commands.h"
@@ -17,6 +20,7 @@ struct QuicklookOptions {
     std::string raster, picture, looks, db = "auto";
     int width = 1000;
     bool waitbar = false;
+    int threads = 0;
 };
 
 struct Looks {
@@ -43,16 +47,15 @@ Looks looks_of(const QuicklookOptions& options, const DataFile& raster) {
     return {static_cast<int>(looks->first), static_cast<int>(looks->second)};
 }
 
-/** The mean power of looks x looks samples each, over the whole raster, read tile by tile. Looks at the far ends
- * that are not full are left out. */
+/** The mean power of looks x looks samples each, over the whole raster. Looks at the far ends that are not full
+ * are left out. */
 class Multilook {
 public:
     Multilook(const RasterDescription& raster, const std::string& name, Looks looks)
         : looks_{std::min(looks.azimuth, raster.NrOfLinesPerImage),
                  std::min(looks.range, raster.NrOfPixelsPerLine)},
           width_{static_cast<std::size_t>(raster.NrOfPixelsPerLine / looks_.range)},
-          height_{static_cast<std::size_t>(raster.NrOfLinesPerImage / looks_.azimuth)},
-          file_{name, raster} {
+          height_{static_cast<std::size_t>(raster.NrOfLinesPerImage / looks_.azimuth)} {
         if (width_ * height_ > kMostPixels) {
             throw Failure(name + ": a picture of " + std::to_string(width_) + " x " + std::to_string(height_) +
                           " pixels is too large; take more looks");
@@ -60,20 +63,23 @@ public:
         power_.assign(width_ * height_, 0.0F);
     }
 
-    void run(bool waitbar) {
-        const int lines = static_cast<int>(height_) * looks_.azimuth;
-        const int samples = static_cast<int>(width_) * looks_.range;
+    /** Each thread reads by itself and works on rows of pixels that are its alone. */
+    void run(const RasterDescription& raster, const std::string& name, int threads, bool waitbar) {
         Progress progress{waitbar ? "Quick look" : nullptr};
-        const std::int64_t bytes = file_.description().element_sizeof();
-        for_each_tile(lines, samples, looks_.range, [&](const Tile& tile) {
+        const std::int64_t bytes = raster.rasterSize() / std::max<std::int64_t>(1, rows());
+        std::int64_t begun = 0, done = 0;
+        const auto next = [&]() -> std::optional<std::int64_t> {
             throw_if_interrupted();
-            file_.description().is_complex() != 0 ? add(tile, complex_) : add(tile, real_);
-            const std::int64_t done =
-                std::int64_t{tile.first_line + tile.lines - 1} * samples + tile.first_sample + tile.samples;
-            progress.step(done * bytes, std::int64_t{lines} * samples * bytes);
-        });
-        const float scale = 1.0F / (static_cast<float>(looks_.azimuth) * static_cast<float>(looks_.range));
-        for (float& value : power_) value *= scale;
+            if (begun == rows()) return std::nullopt;
+            return begun++;
+        };
+        const auto make_band = [&] { return std::make_unique<Band>(*this, name, raster); };
+        blocks::in_order(
+            threads, next, [&] { return [band = make_band()](std::int64_t row) { return band->add(row); }; },
+            [&](bool has_power) {
+                has_power_ |= has_power;
+                progress.step(++done * bytes, rows() * bytes);
+            });
     }
 
     [[nodiscard]] std::size_t width() const { return width_; }
@@ -86,32 +92,62 @@ public:
 private:
     static constexpr std::size_t kMostPixels = std::size_t{1} << 26;
 
-    template <typename T>
-    void add(const Tile& tile, std::vector<T>& room) {
-        room.resize(tile.size());
-        file_.read(tile, room.data());
-        const T* from = room.data();
-        const auto first = static_cast<std::size_t>(tile.first_sample / looks_.range);
-        for (int line = tile.first_line; line < tile.first_line + tile.lines; ++line) {
-            float* to = power_.data() + static_cast<std::size_t>(line / looks_.azimuth) * width_ + first;
-            for (int pixel = 0; pixel < tile.samples / looks_.range; ++pixel) {
-                for (int look = 0; look < looks_.range; ++look) {
-                    const float value = std::norm(*from++);
-                    const bool finite = std::isfinite(value);
-                    to[pixel] += finite ? value : 0.0F;
-                    has_power_ |= finite;
+    [[nodiscard]] std::int64_t rows() const { return static_cast<std::int64_t>(height_); }
+
+    /** What a thread adds up: rows of pixels, tile by tile. */
+    class Band {
+    public:
+        Band(Multilook& whole, const std::string& name, const RasterDescription& raster)
+            : whole_{whole}, file_{name, raster} {}
+
+        /** Whether a row of pixels has power. */
+        bool add(std::int64_t row) {
+            has_power_ = false;
+            const Looks looks = whole_.looks_;
+            row_ = std::span{whole_.power_}.subspan(static_cast<std::size_t>(row) * whole_.width_, whole_.width_);
+            const int first_line = static_cast<int>(row) * looks.azimuth;
+            for_each_tile(looks.azimuth, static_cast<int>(whole_.width_) * looks.range, looks.range,
+                          [&](Tile tile) {
+                              tile.first_line += first_line;
+                              file_.description().is_complex() != 0 ? add(tile, complex_) : add(tile, real_);
+                          });
+            const float scale = 1.0F / (static_cast<float>(looks.azimuth) * static_cast<float>(looks.range));
+            for (float& value : row_) value *= scale;
+            return has_power_;
+        }
+
+    private:
+        template <typename T>
+        void add(const Tile& tile, std::vector<T>& room) {
+            const int looks = whole_.looks_.range;
+            room.resize(tile.size());
+            file_.read(tile, room.data());
+            const T* from = room.data();
+            for (int line = 0; line < tile.lines; ++line) {
+                float* to = row_.data() + tile.first_sample / looks;
+                for (int pixel = 0; pixel < tile.samples / looks; ++pixel) {
+                    for (int look = 0; look < looks; ++look) {
+                        const float value = std::norm(*from++);
+                        const bool finite = std::isfinite(value);
+                        to[pixel] += finite ? value : 0.0F;
+                        has_power_ |= finite;
+                    }
                 }
             }
         }
-    }
+
+        Multilook& whole_;
+        RasterReader file_;
+        std::span<float> row_;
+        bool has_power_ = false;
+        std::vector<float> real_;  // the samples of a tile, as the raster has them
+        std::vector<fcomplex> complex_;
+    };
 
     Looks looks_;
     std::size_t width_, height_;
-    RasterReader file_;
     std::vector<float> power_;
     bool has_power_ = false;
-    std::vector<float> real_;  // the samples of a tile, as the raster has them
-    std::vector<fcomplex> complex_;
 };
 
 double decibel(float power) {
@@ -153,7 +189,7 @@ int quicklook(const QuicklookOptions& options) {
     read_samples_description(options.raster, raster);
     note_interrupts();
     Multilook multilook{raster, options.raster, looks_of(options, raster)};
-    multilook.run(options.waitbar);
+    multilook.run(raster, options.raster, options.threads, options.waitbar);
     const Stretch stretch = stretch_of(options, multilook.power());
     Picture picture{multilook.width(), multilook.height(), {}};
     picture.grey.reserve(multilook.power().size());
@@ -180,6 +216,7 @@ void add_quicklook(CLI::App& app, Job& job) {
     command->add_option("--width", options.width, "Greatest width in pixels, in place of --looks (1000)")
         ->excludes(looks);
     add_waitbar_option(*command, options.waitbar);
+    add_threads_option(*command, options.threads);
 }
 
 }  // namespace tool

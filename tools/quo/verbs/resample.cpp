@@ -1,6 +1,7 @@
 #include <algorithm>
 #include <climits>
 #include <complex>
+#include <memory>
 #include <numbers>
 #include <optional>
 
@@ -20,6 +21,7 @@ struct ResampleOptions {
     int samples = 0, lines = 0;  // one of them is wanted
     double centre = 0.0;         // cycles per sample
     bool waitbar = false;
+    int threads = 0;
 };
 
 /** Width and height of an image in memory. */
@@ -105,105 +107,147 @@ public:
     }
 };
 
+/** A part of a raster that is resampled at once: where it is read, how many of the columns that come of it are
+ * known already, and where the rest is written. */
+struct Part {
+    Tile from;
+    int known;
+    Tile to;
+};
+
+/** What became of a part. */
+struct Resampled {
+    Tile to;
+    std::vector<fcomplex> samples;
+};
+
+/** What a thread needs to resample parts of one size. */
+class PartResampler {
+public:
+    PartResampler(const std::string& name, const RasterDescription& in, const Size& from, const Size& to,
+                  double centre)
+        : in_{name, in}, from_{from}, to_{to}, resampler_{from, to, centre}, source_(from.count()) {}
+
+    Resampled run(const Part& part) {
+        Resampled result{part.to, std::vector<fcomplex>(to_.count())};
+        in_.read(part.from, source_.data());
+        resampler_.run(source_.data(), result.samples.data());
+        drop_columns(result.samples, part.known);
+        return result;
+    }
+
+private:
+    // The first columns: the strip before has them.
+    void drop_columns(std::vector<fcomplex>& samples, int known) const {
+        for (int line = 0; known > 0 && line < to_.ny; ++line) {
+            const auto row = samples.begin() + std::ptrdiff_t{line} * to_.nx;
+            std::copy(row + known, row + to_.nx, samples.begin() + std::ptrdiff_t{line} * (to_.nx - known));
+        }
+    }
+
+    RasterReader in_;
+    Size from_, to_;
+    Resampler resampler_;
+    std::vector<fcomplex> source_;
+};
+
 /** A raster of another number of samples or lines. */
 class Resampling {
 public:
     Resampling(const ResampleOptions& options, const RasterDescription& in)
-        : lines_{options.lines > 0},
-          centre_{options.centre},
-          in_{options.in, in},
-          out_{options.out, Wanted{options, in}} {}
+        : options_{options}, in_{in}, out_{options.out, Wanted{options, in}} {}
 
-    void run(bool waitbar) {
-        {
-            Progress progress{waitbar ? "Resampling" : nullptr};
-            lines_ ? by_strips(progress) : by_lines(progress);
-        }
+    void run() {
+        options_.lines > 0 ? by_strips() : by_lines();
         out_.commit();
     }
 
 private:
-    [[nodiscard]] const RasterDescription& from() const { return in_.description(); }
     [[nodiscard]] const RasterDescription& to() const { return out_.description(); }
 
     // Each line is an image of its own, so that nothing depends on how many are read at once.
-    void by_lines(Progress& progress) {
-        const Size in{from().NrOfPixelsPerLine, 1}, out{to().NrOfPixelsPerLine, 1};
-        Resampler resampler{in, out, centre_};
-        source_.resize(in.count());
-        result_.resize(out.count());
-        for (int line = 0; line < from().NrOfLinesPerImage; ++line) {
+    void by_lines() {
+        const Size from{in_.NrOfPixelsPerLine, 1}, into{to().NrOfPixelsPerLine, 1};
+        int line = 0;
+        const auto next = [&]() -> std::optional<Part> {
             throw_if_interrupted();
-            in_.read({line, 1, 0, in.nx}, source_.data());
-            resampler.run(source_.data(), result_.data());
-            write({line, 1, 0, out.nx});
-            progress.step(sample_offset(to(), line, out.nx), to().rasterSize());
-        }
+            if (line == in_.NrOfLinesPerImage) return std::nullopt;
+            const Part part{{line, 1, 0, from.nx}, 0, {line, 1, 0, into.nx}};
+            ++line;
+            return part;
+        };
+        run_parts(from, into, next);
     }
 
     // Whole columns, as many of them as memory should hold; the last strip may overlap the one before.
-    void by_strips(Progress& progress) {
-        const int lines_in = from().NrOfLinesPerImage, lines_out = to().NrOfLinesPerImage;
-        const int samples = from().NrOfPixelsPerLine;
+    void by_strips() {
+        const int lines_in = in_.NrOfLinesPerImage, lines_out = to().NrOfLinesPerImage;
+        const int samples = in_.NrOfPixelsPerLine;
         const auto fitting = kStripSamples / (std::int64_t{lines_in} + lines_out);
         const int width = static_cast<int>(std::clamp<std::int64_t>(fitting, 1, samples));
-        const Size in{width, lines_in}, out{width, lines_out};
-        Resampler resampler{in, out, centre_};
+        const Size from{width, lines_in}, into{width, lines_out};
+        const Resampler can_be_had{from, into, options_.centre};
         take_room();
-        source_.resize(in.count());
-        result_.resize(out.count());
-        for (std::int64_t next = 0; next < samples; next += width) {
+        std::int64_t begun = 0;
+        const auto next = [&]() -> std::optional<Part> {
             throw_if_interrupted();
-            const int first = static_cast<int>(std::min<std::int64_t>(next, samples - width));
-            in_.read({0, lines_in, first, width}, source_.data());
-            resampler.run(source_.data(), result_.data());
-            const int known = static_cast<int>(next) - first;
-            keep_columns(known, width, lines_out);
-            write({0, lines_out, first + known, width - known});
-            progress.step((first + width) * std::int64_t{lines_out}, std::int64_t{samples} * lines_out);
-        }
+            if (begun >= samples) return std::nullopt;
+            const int first = static_cast<int>(std::min<std::int64_t>(begun, samples - width));
+            const int known = static_cast<int>(begun) - first;
+            begun += width;
+            return Part{{0, lines_in, first, width}, known, {0, lines_out, first + known, width - known}};
+        };
+        run_parts(from, into, next);
     }
 
-    // Takes the first columns out of the result: the strip before has them.
-    void keep_columns(int first, int width, int lines) {
-        for (int line = 0; first > 0 && line < lines; ++line) {
-            const auto row = result_.begin() + std::ptrdiff_t{line} * width;
-            std::copy(row + first, row + width, result_.begin() + std::ptrdiff_t{line} * (width - first));
-        }
+    template <typename Next>
+    void run_parts(const Size& from, const Size& into, Next next) {
+        Progress progress{options_.waitbar ? "Resampling" : nullptr};
+        std::int64_t done = 0;
+        const auto make_worker = [&] {
+            return [own = std::make_unique<PartResampler>(options_.in, in_, from, into, options_.centre)](
+                       const Part& part) { return own->run(part); };
+        };
+        const std::int64_t bytes = to().element_sizeof();
+        blocks::in_order(options_.threads, next, make_worker, [&](const Resampled& part) {
+            write(part.to, part.samples);
+            done += static_cast<std::int64_t>(part.to.size());
+            progress.step(done * bytes, bytes * to().NrOfLinesPerImage * to().NrOfPixelsPerLine);
+        });
     }
 
     // Strips leave gaps for those that follow: a disk that is too small must be found before.
     void take_room() {
-        for_each_tile(to().NrOfLinesPerImage, to().NrOfPixelsPerLine, 1, [this](const Tile& tile) {
+        std::vector<fcomplex> nothing;
+        for_each_tile(to().NrOfLinesPerImage, to().NrOfPixelsPerLine, 1, [&](const Tile& tile) {
             throw_if_interrupted();
-            result_.assign(tile.size(), {});
-            write(tile);
+            nothing.resize(tile.size());
+            write(tile, nothing);
         });
     }
 
-    void write(const Tile& tile) {
-        if (to().CellType == FLOAT_COMPLEX) return out_.write(tile, result_.data());
+    void write(const Tile& tile, const std::vector<fcomplex>& samples) {
+        if (to().CellType == FLOAT_COMPLEX) return out_.write(tile, samples.data());
         if (to().is_complex() != 0) {
-            doubles_.assign(result_.begin(), result_.begin() + static_cast<std::ptrdiff_t>(tile.size()));
+            doubles_.assign(samples.begin(), samples.begin() + static_cast<std::ptrdiff_t>(tile.size()));
             return out_.write(tile, doubles_.data());
         }
-        to().CellType == FLOAT32 ? write_real(tile, real_singles_) : write_real(tile, real_doubles_);
+        to().CellType == FLOAT32 ? write_real(tile, samples, real_singles_)
+                                 : write_real(tile, samples, real_doubles_);
     }
     template <typename T>
-    void write_real(const Tile& tile, std::vector<T>& room) {
+    void write_real(const Tile& tile, const std::vector<fcomplex>& samples, std::vector<T>& room) {
         room.resize(tile.size());
-        std::transform(result_.begin(), result_.begin() + static_cast<std::ptrdiff_t>(tile.size()), room.begin(),
+        std::transform(samples.begin(), samples.begin() + static_cast<std::ptrdiff_t>(tile.size()), room.begin(),
                        [](fcomplex value) { return static_cast<T>(value.real()); });
         out_.write(tile, room.data());
     }
 
-    static constexpr std::int64_t kStripSamples = 8 << 20;  // read and written: 64 MiB
+    static constexpr std::int64_t kStripSamples = 8 << 20;  // read and written: 64 MiB for each thread
 
-    bool lines_;
-    double centre_;
-    RasterReader in_;
+    const ResampleOptions& options_;
+    const RasterDescription& in_;
     NewRaster out_;
-    std::vector<fcomplex> source_, result_;
     std::vector<dcomplex> doubles_;
     std::vector<float> real_singles_;
     std::vector<double> real_doubles_;
@@ -223,7 +267,7 @@ int resample(const ResampleOptions& options) {
     if (options.centre != 0.0 && description.is_complex() == 0)
         throw WrongUse("--centre: samples that are real have a band around 0");
     note_interrupts();
-    Resampling{options, description}.run(options.waitbar);
+    Resampling{options, description}.run();
     return kFine;
 }
 
@@ -240,6 +284,7 @@ void add_resample(CLI::App& app, Job& job) {
     command->add_option("--centre", options.centre, "Centre of the band in cycles per sample, where it is not 0")
         ->check(defect_of_centre);
     add_waitbar_option(*command, options.waitbar);
+    add_threads_option(*command, options.threads);
 }
 
 }  // namespace tool

@@ -1,9 +1,12 @@
 #include <algorithm>
 #include <cmath>
 #include <complex>
+#include <functional>
 #include <limits>
+#include <memory>
 #include <nlohmann/json.hpp>
 #include <numbers>
+#include <optional>
 
 #include "apart.h"
 #include "commands.h"
@@ -20,6 +23,7 @@ namespace {
 struct SpectrumOptions {
     std::string raster, picture, header;
     bool json = false, waitbar = false;
+    int threads = 0;
 };
 
 constexpr int kLongest = 1024;  // samples and lines of a segment
@@ -44,41 +48,23 @@ std::vector<int> starts(int in_all, int length) {
     return firsts;
 }
 
-/** The power spectra of a raster of any size, segment by segment. */
-class Spectra {
+/** The power spectra of one segment along both axes. */
+struct SegmentPower {
+    Power range, azimuth;
+};
+
+/** What a thread needs to look at segments of a raster. */
+class Segments {
 public:
-    Spectra(const std::string& name, const RasterDescription& description)
-        : lines_{std::min(kLongest, description.NrOfLinesPerImage)},
-          samples_{std::min(kLongest, description.NrOfPixelsPerLine)},
-          file_{name, description},
-          along_{samples_, lines_, +1, 0},
-          down_{samples_, lines_, 0, +1} {}
+    Segments(const std::string& name, const RasterDescription& description, int lines, int samples)
+        : file_{name, description},
+          along_{samples, lines, +1, 0},
+          down_{samples, lines, 0, +1},
+          range_window_{hann(samples)},
+          azimuth_window_{hann(lines)} {}
 
-    void run(bool waitbar) {
-        Progress progress{waitbar ? "Spectrum" : nullptr};
-        const RasterDescription& raster = file_.description();
-        const auto first_lines = starts(raster.NrOfLinesPerImage, lines_);
-        const auto first_samples = starts(raster.NrOfPixelsPerLine, samples_);
-        const auto in_all = static_cast<std::int64_t>(first_lines.size() * first_samples.size());
-        for (const int line : first_lines)
-            for (const int sample : first_samples) {
-                throw_if_interrupted();
-                add({line, lines_, sample, samples_});
-                progress.step(++segments_ * segment_bytes(), in_all * segment_bytes());
-            }
-    }
-
-    [[nodiscard]] int lines() const { return lines_; }
-    [[nodiscard]] int samples() const { return samples_; }
-    [[nodiscard]] std::int64_t segments() const { return segments_; }
-    [[nodiscard]] const Power& range() const { return range_; }
-    [[nodiscard]] const Power& azimuth() const { return azimuth_; }
-
-private:
-    [[nodiscard]] std::int64_t segment_bytes() const {
-        return std::int64_t{lines_} * samples_ * file_.description().element_sizeof();
-    }
-    void add(const Tile& tile) {
+    SegmentPower look_at(const Tile& tile) {
+        SegmentPower power{Power(range_window_.size()), Power(azimuth_window_.size())};
         segment_.resize(tile.size());
         file_.read(tile, segment_.data());
         for (fcomplex& value : segment_)
@@ -87,29 +73,74 @@ private:
         each([&](std::size_t /*line*/, std::size_t sample, fcomplex& value) { value *= range_window_[sample]; });
         along_.run(work_.data());
         each([&](std::size_t /*line*/, std::size_t sample, fcomplex& value) {
-            range_[sample] += std::norm(value);
+            power.range[sample] += std::norm(value);
         });
         work_ = segment_;
         each([&](std::size_t line, std::size_t /*sample*/, fcomplex& value) { value *= azimuth_window_[line]; });
         down_.run(work_.data());
         each([&](std::size_t line, std::size_t /*sample*/, fcomplex& value) {
-            azimuth_[line] += std::norm(value);
+            power.azimuth[line] += std::norm(value);
         });
+        return power;
     }
+
+private:
     template <typename Work>
     void each(Work work) {
         auto value = work_.begin();
-        for (std::size_t line = 0; line < azimuth_.size(); ++line)
-            for (std::size_t sample = 0; sample < range_.size(); ++sample) work(line, sample, *value++);
+        for (std::size_t line = 0; line < azimuth_window_.size(); ++line)
+            for (std::size_t sample = 0; sample < range_window_.size(); ++sample) work(line, sample, *value++);
     }
 
-    int lines_, samples_;
-    std::int64_t segments_ = 0;
     RasterReader file_;
     Transform along_, down_;
-    std::vector<float> range_window_ = hann(samples_), azimuth_window_ = hann(lines_);
-    Power range_ = Power(static_cast<std::size_t>(samples_)), azimuth_ = Power(static_cast<std::size_t>(lines_));
+    std::vector<float> range_window_, azimuth_window_;
     std::vector<fcomplex> segment_, work_;
+};
+
+/** The power spectra of a raster of any size, segment by segment. */
+class Spectra {
+public:
+    explicit Spectra(const RasterDescription& description)
+        : lines_{std::min(kLongest, description.NrOfLinesPerImage)},
+          samples_{std::min(kLongest, description.NrOfPixelsPerLine)} {
+        for (const int line : starts(description.NrOfLinesPerImage, lines_))
+            for (const int sample : starts(description.NrOfPixelsPerLine, samples_))
+                tiles_.push_back({line, lines_, sample, samples_});
+    }
+
+    void run(const std::string& name, const RasterDescription& description, int threads, bool waitbar) {
+        Progress progress{waitbar ? "Spectrum" : nullptr};
+        const std::int64_t bytes = std::int64_t{lines_} * samples_ * description.element_sizeof();
+        auto tile = tiles_.cbegin();
+        std::int64_t done = 0;
+        const auto next = [&]() -> std::optional<Tile> {
+            throw_if_interrupted();
+            if (tile == tiles_.cend()) return std::nullopt;
+            return *tile++;
+        };
+        const auto make_worker = [&] {
+            return [own = std::make_unique<Segments>(name, description, lines_, samples_)](const Tile& segment) {
+                return own->look_at(segment);
+            };
+        };
+        blocks::in_order(threads, next, make_worker, [&](const SegmentPower& power) {
+            std::ranges::transform(range_, power.range, range_.begin(), std::plus{});
+            std::ranges::transform(azimuth_, power.azimuth, azimuth_.begin(), std::plus{});
+            progress.step(++done * bytes, segments() * bytes);
+        });
+    }
+
+    [[nodiscard]] int lines() const { return lines_; }
+    [[nodiscard]] int samples() const { return samples_; }
+    [[nodiscard]] std::int64_t segments() const { return static_cast<std::int64_t>(tiles_.size()); }
+    [[nodiscard]] const Power& range() const { return range_; }
+    [[nodiscard]] const Power& azimuth() const { return azimuth_; }
+
+private:
+    int lines_, samples_;
+    std::vector<Tile> tiles_;
+    Power range_ = Power(static_cast<std::size_t>(samples_)), azimuth_ = Power(static_cast<std::size_t>(lines_));
 };
 
 /** What a spectrum tells, in cycles per sample. */
@@ -176,8 +207,8 @@ int spectrum(const SpectrumOptions& options) {
     DataFile raster;
     read_samples_description(options.raster, raster);
     note_interrupts();
-    Spectra spectra{options.raster, raster};
-    spectra.run(options.waitbar);
+    Spectra spectra{raster};
+    spectra.run(options.raster, raster, options.threads, options.waitbar);
     if (!(*std::ranges::max_element(spectra.range()) > 0.0)) throw Failure(options.raster + ": holds no signal");
     const Band range = band_of(spectra.range()), azimuth = band_of(spectra.azimuth());
     write_png(plot({curve_of("range", spectra.range(), range.centre, rates.range, rates.unit),
@@ -214,6 +245,7 @@ void add_spectrum(CLI::App& app, Job& job) {
     command->add_option("--header", options.header, "Header with the sampling rates, for frequencies in Hz");
     command->add_flag("--json", options.json, "Print JSON");
     add_waitbar_option(*command, options.waitbar);
+    add_threads_option(*command, options.threads);
 }
 
 }  // namespace tool

@@ -1,7 +1,9 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <memory>
 #include <nlohmann/json.hpp>
+#include <optional>
 #include <span>
 
 #include "commands.h"
@@ -16,10 +18,12 @@ struct TiepointsOptions {
     std::vector<std::string> headers;
     std::string points, incidence;
     bool json = false;
+    int threads = 0;
 };
 
 /** A ground point whose place in the image is known from elsewhere. */
 struct TiePoint {
+    std::int64_t line_number;  // of the table
     double time_s, range_s;
     GeodeticPoint ground;
     double incidence_deg;
@@ -52,7 +56,14 @@ double incidence_deg(const quo::Vec3& platform, const TiePoint& tie, const quo::
                      vertical == Vertical::kGeocentricRadius ? point : quo::ellipsoid_normal(tie.ground));
 }
 
-int compare(GeneralSAROrbit& orbit, const TiePoint& tie, Agreement& agreement) {
+/** How far the geometry is off one tie point, in the order of kQuantity. */
+struct Compared {
+    const TiePoint* tie;
+    int status;
+    std::array<double, kQuantities> off;
+};
+
+Compared compare(GeneralSAROrbit& orbit, const TiePoint& tie, Vertical vertical) {
     double truth[3], point[3], platform[3];
     quo::store(quo::from_geodetic(tie.ground), truth);
     double time_s = 0.0;
@@ -60,21 +71,20 @@ int compare(GeneralSAROrbit& orbit, const TiePoint& tie, Agreement& agreement) {
     int status = orbit.earth2sat(truth, &time_s, &range_s);
     if (status == 0) status = orbit.sat2earth(tie.time_s, tie.range_s, 0.0, tie.ground.height_m, point);
     if (status == 0) status = orbit.SVGetPos(tie.time_s, platform);
-    if (status != 0) return status;
+    if (status != 0) return {&tie, status, {}};
 
     const quo::Vec3 found = quo::load(point);
-    const double incidence = incidence_deg(quo::load(platform), tie, found, agreement.vertical);
-    agreement.residuals[0].add((time_s - tie.time_s) * 1e6);
-    agreement.residuals[1].add((range_s - tie.range_s) * 0.5 * quo::kLightSpeed);
-    agreement.residuals[2].add(norm(found - quo::load(truth)));
-    agreement.residuals[3].add(incidence - tie.incidence_deg);
-    return 0;
+    const double incidence = incidence_deg(quo::load(platform), tie, found, vertical);
+    return {&tie,
+            0,
+            {(time_s - tie.time_s) * 1e6, (range_s - tie.range_s) * 0.5 * quo::kLightSpeed,
+             norm(found - quo::load(truth)), incidence - tie.incidence_deg}};
 }
 
 /** The tie point of a row; throws Failure where a number is missing, since a truth with holes proves nothing. */
 TiePoint tie_point(const Table& table, std::span<const std::size_t> columns) {
     const std::vector<double> v = table.numbers(columns);
-    return {v[0], v[1], {v[2], v[3], v[4]}, v[5]};
+    return {table.input().line_number(), v[0], v[1], {v[2], v[3], v[4]}, v[5]};
 }
 
 Vertical vertical_of(const Table& table, const std::string& option) {
@@ -99,6 +109,40 @@ std::string scene_name(const std::string& header) {
     return file.substr(0, file.rfind('.'));
 }
 
+/** Compares block by block, each with an orbit as freshly read, so that nothing hangs on the threads. */
+template <typename Complain>
+void compare_all(Scene& scene, std::span<const TiePoint> ties, int threads, Agreement& agreement,
+                 Complain complain_of) {
+    constexpr std::size_t kAtOnce = 1024;
+    const auto next = [&]() -> std::optional<std::span<const TiePoint>> {
+        if (ties.empty()) return std::nullopt;
+        const auto block = ties.first(std::min(kAtOnce, ties.size()));
+        ties = ties.subspan(block.size());
+        return block;
+    };
+    const auto make_worker = [&] {
+        auto loaded = std::make_unique<GeneralSAROrbit>();
+        require_solved(scene.orbit().clone(loaded.get()));
+        return [&, own = std::move(loaded)](std::span<const TiePoint> block) {
+            GeneralSAROrbit orbit;
+            require_solved(own->clone(&orbit));
+            std::vector<Compared> all;
+            for (const TiePoint& tie : block) all.push_back(compare(orbit, tie, agreement.vertical));
+            return all;
+        };
+    };
+    blocks::in_order(threads, next, make_worker, [&](const std::vector<Compared>& all) {
+        for (const Compared& compared : all) {
+            if (compared.status != 0) {
+                ++agreement.unsolved;
+                complain_of(compared);
+                continue;
+            }
+            for (std::size_t i = 0; i < kQuantities; ++i) agreement.residuals[i].add(compared.off[i]);
+        }
+    });
+}
+
 Agreement check_scene(const std::string& header, const TiepointsOptions& options) {
     Scene scene{header};
     scene.require_look_side();
@@ -109,13 +153,12 @@ Agreement check_scene(const std::string& header, const TiepointsOptions& options
                                    table.need("height_m"),       table.need("incidence_deg")};
     Agreement agreement{
         .scene = scene_name(header), .vertical = vertical_of(table, options.incidence), .residuals = {}};
-    while (table.next()) {
-        ++agreement.points;
-        const int status = compare(scene.orbit(), tie_point(table, columns), agreement);
-        if (status == 0) continue;
-        ++agreement.unsolved;
-        complain(table.place() + ": status " + status_text(status));
-    }
+    std::vector<TiePoint> ties;
+    while (table.next()) ties.push_back(tie_point(table, columns));
+    agreement.points = static_cast<std::int64_t>(ties.size());
+    compare_all(scene, ties, options.threads, agreement, [&](const Compared& compared) {
+        complain(table.place(compared.tie->line_number) + ": status " + status_text(compared.status));
+    });
     return agreement;
 }
 
@@ -201,6 +244,7 @@ void add_tiepoints(CLI::App& app, Job& job) {
             "\"incidence: ellipsoid normal\" says")
         ->check(CLI::IsMember({"normal", "geocentric"}));
     command->add_flag("--json", options.json, "Print JSON");
+    add_threads_option(*command, options.threads);
 }
 
 }  // namespace tool
