@@ -65,7 +65,7 @@ inline void write_text(const std::filesystem::path& path, std::string_view text)
 inline std::vector<std::vector<std::string>> read_table(const std::string& name, char separator = ',',
                                                         std::size_t columns = 100) {
     std::istringstream lines{read_text(QUO_TEST_DATA + ("/" + name))};
-    EXPECT_NE(lines.str(), "") << name;
+    if (lines.str().empty()) throw std::runtime_error("no table " + name);
     std::vector<std::vector<std::string>> rows;
     for (std::string line; std::getline(lines, line);) {
         if (line.starts_with('#')) continue;
