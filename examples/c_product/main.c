@@ -1,10 +1,9 @@
 /* A product from C: who made it, where a sample lies on the ground, when that place is seen, and a block of the
  * raster where there is one. Usage: product HEADER AZIMUTH_S RANGE_S; the result is the status of what failed. */
-#include "quo_base/product.h"
-
 #include <stdio.h>
 #include <stdlib.h>
 
+#include "quo_base/product.h"
 
 enum { kPoints = 3 };
 
