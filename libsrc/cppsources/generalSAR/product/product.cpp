@@ -242,21 +242,23 @@ int quo_product_to_ground(const quo_product* product, std::size_t count, const d
                           double* latitude_deg, double* longitude_deg, double* ground_height_m, double* x_m,
                           double* y_m, double* z_m, double* incidence_deg, double* look_deg, double* fm_rate_hz_s,
                           double* speed_m_s, std::int32_t* status) noexcept {
+    const OrbitSamples samples{count, azimuth_s, range_s, doppler_hz, height_m};
+    OrbitGround ground;
+    ground.latitude_deg = latitude_deg;
+    ground.longitude_deg = longitude_deg;
+    ground.height_m = ground_height_m;
+    ground.x_m = x_m;
+    ground.y_m = y_m;
+    ground.z_m = z_m;
+    ground.incidence_deg = incidence_deg;
+    ground.look_deg = look_deg;
+    ground.fm_rate_hz_s = fm_rate_hz_s;
+    ground.speed_m_s = speed_m_s;
+    ground.status = status;
     return with_product("quo_product_to_ground", product, [&](quo::CallFrame& frame, const OpenProduct& open) {
         if (const char* missing = missing_geometry(open.header, true, doppler_hz || fm_rate_hz_s))
             return frame.fail(QUO_REFUSED, missing);
-        const OrbitGround ground{.latitude_deg = latitude_deg,
-                                 .longitude_deg = longitude_deg,
-                                 .height_m = ground_height_m,
-                                 .x_m = x_m,
-                                 .y_m = y_m,
-                                 .z_m = z_m,
-                                 .incidence_deg = incidence_deg,
-                                 .look_deg = look_deg,
-                                 .fm_rate_hz_s = fm_rate_hz_s,
-                                 .speed_m_s = speed_m_s,
-                                 .status = status};
-        const int failed = open.header.orbit.sat2earth({count, azimuth_s, range_s, doppler_hz, height_m}, ground);
+        const int failed = open.header.orbit.sat2earth(samples, ground);
         return failed ? frame.callee(failed) : frame.success();
     });
 }
@@ -265,18 +267,22 @@ int quo_product_to_radar(const quo_product* product, std::size_t count, const do
                          const double* longitude_deg, const double* height_m, const double* x_m, const double* y_m,
                          const double* z_m, const double* doppler_hz, double* azimuth_s, double* range_s,
                          std::int32_t* status) noexcept {
+    const OrbitTargets targets{.count = count,
+                               .latitude_deg = latitude_deg,
+                               .longitude_deg = longitude_deg,
+                               .height_m = height_m,
+                               .x_m = x_m,
+                               .y_m = y_m,
+                               .z_m = z_m,
+                               .doppler_hz = doppler_hz};
+    OrbitSightings seen;
+    seen.azimuth_s = azimuth_s;
+    seen.range_s = range_s;
+    seen.status = status;
     return with_product("quo_product_to_radar", product, [&](quo::CallFrame& frame, const OpenProduct& open) {
         if (const char* missing = missing_geometry(open.header, false, doppler_hz != nullptr))
             return frame.fail(QUO_REFUSED, missing);
-        const OrbitTargets targets{.count = count,
-                                   .latitude_deg = latitude_deg,
-                                   .longitude_deg = longitude_deg,
-                                   .height_m = height_m,
-                                   .x_m = x_m,
-                                   .y_m = y_m,
-                                   .z_m = z_m,
-                                   .doppler_hz = doppler_hz};
-        const int failed = open.header.orbit.earth2sat(targets, {azimuth_s, range_s, status});
+        const int failed = open.header.orbit.earth2sat(targets, seen);
         return failed ? frame.callee(failed) : frame.success();
     });
 }
