@@ -64,7 +64,9 @@ QUO_BASE_API int quo_product_length(const quo_product* product, const char* fiel
 QUO_BASE_API int quo_product_number(const quo_product* product, const char* field, double* number) QUO_NOEXCEPT;
 
 /** All values of a field of numbers, quo_product_length() of them.
- * @param[in] room  numbers that `numbers` has room for
+ * @param[in]  product, field  whose values
+ * @param[out] numbers         the values
+ * @param[in]  room            numbers that there is room for
  * @return 1 also for a text, and where there are more values than room. Without values nothing is written, and
  *         `numbers` may be null. */
 QUO_BASE_API int quo_product_numbers(const quo_product* product, const char* field, double* numbers,
@@ -74,7 +76,9 @@ QUO_BASE_API int quo_product_numbers(const quo_product* product, const char* fie
 #define QUO_PRODUCT_TEXT_ROOM 512
 
 /** The value of a field that holds a text, with a final NUL.
- * @param[in] room  bytes that `text` has room for, the NUL included
+ * @param[in]  product, field  whose text
+ * @param[out] text            the text
+ * @param[in]  room            bytes that there is room for, the NUL included
  * @return 1 also for a number, and for a text that is longer than the room */
 QUO_BASE_API int quo_product_text(const quo_product* product, const char* field, char* text,
                                   size_t room) QUO_NOEXCEPT;
@@ -96,6 +100,7 @@ QUO_BASE_API int quo_product_text(const quo_product* product, const char* field,
  * overlap or that no memory can hold. */
 
 /** Where samples lie on the ground, and how they are seen.
+ * @param[in]  product        whose orbit, wavelength and look side
  * @param[in]  count          number of samples
  * @param[in]  azimuth_s, range_s  times of the samples
  * @param[in]  doppler_hz     Doppler, positive while the target approaches; null for 0
@@ -116,6 +121,7 @@ QUO_BASE_API int quo_product_to_ground(const quo_product* product, size_t count,
                                        int32_t* status) QUO_NOEXCEPT;
 
 /** When ground points are seen, and how far away.
+ * @param[in]  product        whose orbit and wavelength
  * @param[in]  count          number of points
  * @param[in]  latitude_deg, longitude_deg, height_m  the points, height null for 0; or all three null for
  * @param[in]  x_m, y_m, z_m  the points, Earth-fixed
@@ -131,6 +137,7 @@ QUO_BASE_API int quo_product_to_radar(const quo_product* product, size_t count, 
 /* ---- The raster ---- */
 
 /** Shape and type of the raster's samples. Outputs that are not wanted are null.
+ * @param[in]  product         whose raster
  * @param[out] lines, samples  number of lines, and of samples in a line
  * @param[out] cell_type       a RasterCellType
  * @return 0 also for a product without a raster: 0 lines, 0 samples, CELL_NOT_SET */
@@ -142,8 +149,10 @@ QUO_BASE_API int quo_product_raster(const quo_product* product, int32_t* lines, 
  * Samples are converted into `cell_type`, a RasterCellType: real numbers that become integers are rounded half
  * away from zero, what lies beyond an integer's bounds is held there, and not-a-number becomes 0; real samples get
  * the imaginary part 0.
+ * @param[in]  product                   whose raster
  * @param[in]  first_line, first_sample  where the block starts, counted from 0
  * @param[in]  lines, samples            its size; where one is 0 nothing is read, and `block` may be null
+ * @param[in]  cell_type                 type of the block's samples
  * @param[out] block                     lines * samples samples; no alignment is asked
  * @param[in]  room                      bytes that `block` has room for
  * @return 1 also for a product without a raster, a block that is not within it or for which there is no room, and
