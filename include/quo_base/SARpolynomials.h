@@ -2,6 +2,7 @@
 #define QUO_BASE_SARPOLYNOMIALS_H
 
 #include <memory>
+#include <string_view>
 
 #include "quo_base/api.h"
 #include "quo_base/quorelxml_v2.h"
@@ -183,6 +184,9 @@ public:
     int readhdr(const char* file) override;
     /** Copies all lists. 0 or 7. */
     int clone(polySAR* to) const;
+    /** The polynomial that bears a name such as "DopplerCentroid-0" in headers; null where there is none. It stays
+     * until its list is made anew. */
+    const poly* polynomial(std::string_view name) const noexcept;
 
     std::unique_ptr<polyDC[]> DC;              ///< ndc Doppler centroids
     std::unique_ptr<polyFR[]> FR;              ///< nfr FM rates

@@ -1,11 +1,14 @@
 #ifndef QUO_BASE_DATAFILE_H
 #define QUO_BASE_DATAFILE_H
 
+#include "quo_base/api.h"
+
+#ifdef __cplusplus
 #include <memory>
 #include <optional>
 
-#include "quo_base/api.h"
 #include "quo_base/quorelxml_v2.h"
+#endif
 
 /** @file
  * Raster files: flat binary files of lines of samples, each described by a side file of the same name with ".hdr"
@@ -37,6 +40,8 @@ enum RasterCellType {
     INT8 = 9,           /**< 8-bit integer */
     CELL_NOT_SET = 10   /**< a new BufferFile's */
 };
+
+#ifdef __cplusplus
 
 namespace quo {
 class AtomicFile;
@@ -397,5 +402,7 @@ private:
     int64_t size_ = 0, keep_ = 0, cursor_ = 0, fill_ = 0;
     int64_t dirty_first_ = 0, dirty_last_ = 0;  // bytes of the buffer that the file does not have yet
 };
+
+#endif
 
 #endif

@@ -2,6 +2,7 @@
 #define QUO_BASE_GENERALSAR_H
 
 #include <array>
+#include <string_view>
 
 #include "quo_base/SARpolynomials.h"
 #include "quo_base/acquisition.h"
@@ -72,6 +73,12 @@ public:
     /** The object, present or not; the caller casts it to the class that GSObject tells. Null for another number.
      */
     GeneralSAR_Base* GSget(GSObject object) noexcept;
+    /** What the object registers in its section: its own elements or, for gsRoi, those of the region in it. Null
+     * for another number. */
+    const GeneralSAR_Base* GSelements(GSObject object) const noexcept;
+    /** The one of them that stands at a path in headers, such as "SamplingConstants/prf_hz", present or not. Null
+     * for another path or number. */
+    const parElement* GSelement(GSObject object, std::string_view field) const noexcept;
     int GSenable(GSObject object) noexcept;         ///< sets the presence flag; 0, or 1 for another number
     int GSdisable(GSObject object) noexcept;        ///< clears it; 0, or 1 for another number
     bool GSexists(GSObject object) const noexcept;  ///< the presence flag; false for another number

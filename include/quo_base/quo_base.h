@@ -14,6 +14,7 @@
 #include "quo_base/geometry.h"
 #include "quo_base/gr_pt.h"
 #include "quo_base/interp_orb.h"
+#include "quo_base/product.h"
 #include "quo_base/profile.h"
 
 #ifdef __cplusplus

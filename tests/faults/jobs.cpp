@@ -15,6 +15,7 @@
 #include "quo_base/gen_utils.h"
 #include "quo_base/generalSAR_configuration.h"
 #include "quo_base/interp.h"
+#include "quo_base/product.h"
 #include "quo_base/profile.h"
 #include "quo_base/quorelReport.h"
 #include "quo_base/quorelxml_v2.h"
@@ -252,6 +253,20 @@ Run write_stream(Folder folder) {
     };
 }
 
+Run use_handle(Folder folder) {
+    return [header = file_in(folder, "whole.hdr"), file = file_in(folder, "in.raw")] {
+        quo_product* opened = nullptr;
+        double centroids = 0.0;
+        float sample = 0.0F;
+        int status = quo_product_open(header, file, &opened);
+        if (status != 0) return judged(status, false);
+        status = quo_product_number(opened, "PolySAR/ndc", &centroids);
+        if (status == 0) status = quo_product_read(opened, 6, 1, 4, 1, FLOAT32, &sample, sizeof sample);
+        judged(quo_product_close(opened), true);
+        return judged(status, centroids == 2.0 && sample == static_cast<float>(test::part_value(6, 4, 0)));
+    };
+}
+
 /** No file is touched here: what is computed is right, or the status says that memory was short. */
 Run compute(Folder folder) {
     struct Given {
@@ -354,6 +369,7 @@ const std::vector<test::Job>& test::jobs() {
                                  {"Report", kSurvives, report},
                                  {"ReadProduct", kUnchanged, read_product},
                                  {"ReadOrbit", kUnchanged, use_orbit},
+                                 {"UseHandle", kUnchanged, use_handle},
                                  {"ReadDocument", kUnchanged, with_document<quorelxml, read_values>},
                                  {"ReadProfile", kUnchanged, with_profile<read_keys>},
                                  {"FallBack", kUnchanged, fall_back},

@@ -23,6 +23,7 @@
 #include "quo_base/fft.h"
 #include "quo_base/gen_utils.h"
 #include "quo_base/generalSARorbit.h"
+#include "quo_base/product.h"
 #include "quo_base/profile.h"
 #include "quo_base/quorelReport.h"
 #include "quo_base/quorelxml_v2.h"
@@ -221,6 +222,40 @@ TEST_F(Threads, AskOneObjectAtTheSameTime) {
     const double alone = polynomials.EvaluateDC(0.005, 7.0);
     side_by_side([&](int) {
         for (int i = 0; i < 1000; ++i) EXPECT_EQ(polynomials.EvaluateDC(0.005, 7.0), alone);
+    });
+}
+
+// A product is closed by the one thread while the others still work on it.
+TEST_F(Threads, ShareAProductUntilItIsClosed) {
+    const std::string name = file("raster.raw");
+    DataFile raster;
+    raster.setFilename(name.c_str());
+    raster.NrOfPixelsPerLine = 64;
+    raster.NrOfLinesPerImage = 16;
+    raster.CellType = INT16;
+    test::write_text(name, test::raster_bytes(raster));
+    ASSERT_EQ(raster.write_hdr(), 0);
+    const test::CapturedStderr captured;
+    quo_product* product = nullptr;
+    ASSERT_EQ(quo_product_open(test::kScenes[0].path(".xml").c_str(), name.c_str(), &product), 0);
+    side_by_side([&](int thread) {
+        const double t = 1167930360.0, range = 0.0054, same = 12.5;
+        for (int round = 0; round < 100; ++round) {
+            double first_s = same, longitude = same, sample = same;
+            const int status[] = {
+                quo_product_number(product, "StateVectorData/t0SV_s", &first_s),
+                quo_product_to_ground(product, 1, &t, &range, nullptr, nullptr, nullptr, &longitude, nullptr,
+                                      nullptr, nullptr, nullptr, nullptr, nullptr, nullptr, nullptr, nullptr),
+                quo_product_read(product, 3, 1, thread, 1, FLOAT64, &sample, sizeof sample)};
+            EXPECT_EQ(first_s, status[0] ? same : 1167930296.781409);
+            EXPECT_NEAR(longitude, status[1] ? same : 11.68, 0.5);
+            EXPECT_EQ(sample, status[2] ? same : test::part_value(3, thread, 0));
+            if (thread != 0 || round > 50) continue;
+            EXPECT_EQ(std::to_array(status), (std::array{0, 0, 0}));
+            if (round == 50) {
+                EXPECT_EQ(quo_product_close(product), 0);
+            }
+        }
     });
 }
 

@@ -28,8 +28,6 @@ namespace {
 
 constexpr const char* kSource = "datafile";
 constexpr const char* kSection = "RasterInfo";
-constexpr const char* kReadFailed = "File reading failed!";
-constexpr const char* kWriteFailed = "File writing failed!";
 constexpr int kDescriptionElements = 6;
 
 struct CellName {
@@ -90,24 +88,9 @@ bool read_profile(RasterDescription& raster, const char* side_file) {
     return form.complete() && raster.CellType >= 0;
 }
 
-const char* message_of(int status) {
-    switch (status) {
-        case QUO_READ_FAILED:
-            return kReadFailed;
-        case QUO_WRITE_FAILED:
-            return kWriteFailed;
-        case QUO_NO_MEMORY:
-            return "Memory allocation failure";
-        case QUO_NOT_OPENED:
-            return "File not opened!";
-        default:
-            return "The request does not fit the raster";
-    }
-}
-
 // The status of a transfer as an entry of the report, which names the caller's line.
 int finish(quo::CallFrame& frame, int status, int line = __builtin_LINE()) {
-    return status == QUO_OK ? frame.success(line) : frame.fail(status, message_of(status), line);
+    return status == QUO_OK ? frame.success(line) : frame.fail(status, quo::raster_failure(status), line);
 }
 
 // The same for a call that has reported its own failure.
@@ -241,13 +224,13 @@ int DataFile::close() {
     if (!is_open()) return QUO_OK;
     quo::CallFrame frame{"DataFile::close", kSource};
     // What a file open for reading and writing has pending is dropped: there only seek() writes it.
-    if (buffer_ && state_ == 1 && flushBuffer() != QUO_OK) return frame.fail(QUO_WRITE_FAILED, kWriteFailed);
+    if (buffer_ && state_ == 1 && flushBuffer() != QUO_OK) return finish(frame, QUO_WRITE_FAILED);
     buffer_.reset();
     BufferSize = 0;
     position_ = 0;
     cursor_ = fill_ = 0;
     pending_ = false;
-    if (!stream_->close()) return frame.fail(QUO_WRITE_FAILED, kWriteFailed);
+    if (!stream_->close()) return finish(frame, QUO_WRITE_FAILED);
     return frame.success();
 }
 
@@ -328,7 +311,7 @@ int DataFile::read(char* dst, int64_t n) {
     if (!is_open() || state_ == 1 || n < 0) return frame.fail(QUO_REFUSED, "The file is not open for reading");
     if (buffer_) return finish(frame, readBuffered(dst, n));
     if (stream_->read_at(position_, dst, static_cast<std::size_t>(n)).bytes != static_cast<std::size_t>(n)) {
-        return frame.fail(QUO_READ_FAILED, kReadFailed);
+        return finish(frame, QUO_READ_FAILED);
     }
     position_ += n;
     return frame.success();
@@ -402,7 +385,7 @@ int DataFile::clone(const DataFile* source) {
 
 int DataFile::copy(const char* file_name, int overwrite) {
     quo::CallFrame frame{"DataFile::copy", kSource};
-    if (buffer_ && state_ != 0 && flushBuffer() != QUO_OK) return frame.fail(QUO_WRITE_FAILED, kWriteFailed);
+    if (buffer_ && state_ != 0 && flushBuffer() != QUO_OK) return finish(frame, QUO_WRITE_FAILED);
     DataFile target;
     target.clone(this);
     if (target.setFilename(file_name) != QUO_OK) return frame.fail(QUO_REFUSED, "File name too long");

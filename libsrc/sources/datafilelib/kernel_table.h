@@ -7,7 +7,7 @@ namespace quo {
 
 /** The loops by access, memory type and the file's cell type; null where an access does not convert the pair. */
 struct KernelTable {
-    SampleKernel kernels[static_cast<int>(SampleAccess::kBlockWrite) + 1][kCellTypes][kCellTypes];
+    SampleKernel kernels[static_cast<int>(SampleAccess::kAnyRead) + 1][kCellTypes][kCellTypes];
 };
 
 namespace kernels_any {

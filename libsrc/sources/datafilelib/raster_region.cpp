@@ -221,6 +221,21 @@ int write_region(const RasterStream& stream, const RasterRegion& region, const R
     return QUO_OK;
 }
 
+const char* raster_failure(int status) noexcept {
+    switch (status) {
+        case QUO_READ_FAILED:
+            return "File reading failed!";
+        case QUO_WRITE_FAILED:
+            return "File writing failed!";
+        case QUO_NO_MEMORY:
+            return "Memory allocation failure";
+        case QUO_NOT_OPENED:
+            return "File not opened!";
+        default:
+            return "The request does not fit the raster";
+    }
+}
+
 std::string side_file_of(std::string_view raster) { return std::string{raster} + std::string{kSideSuffix}; }
 
 int copy_raster(const char* from, const char* to, bool overwrite, std::optional<AtomicFile>& copy) {

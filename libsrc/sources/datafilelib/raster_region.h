@@ -51,6 +51,9 @@ int read_region(const RasterStream& stream, const RasterRegion& region, const Re
 int write_region(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout,
                  const char* from);
 
+/** What an entry of the report says about a status of the raster classes. */
+const char* raster_failure(int status) noexcept;
+
 constexpr std::string_view kSideSuffix = ".hdr";
 /** Name of the file that describes a raster. */
 std::string side_file_of(std::string_view raster);

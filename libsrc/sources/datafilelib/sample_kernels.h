@@ -17,6 +17,7 @@ enum class SampleAccess : unsigned char {
     kRegionWrite,  ///< BufferIO::writebuffer
     kBlockRead,    ///< BufferFile::readbuffer: rounded half away from zero, held at the bounds
     kBlockWrite,   ///< BufferFile::writebuffer
+    kAnyRead,      ///< every pair but complex samples as real ones; values as for kBlockRead
 };
 
 /** The kernel for reading (file type to memory type) or writing (memory type to file type), or null when the

@@ -6,29 +6,10 @@ namespace quo {
 
 FftEnginePlan* PlanStore::open(FftEngine& engine, const FftGeometry& geometry) {
     std::shared_ptr<FftTransform> transform = transform_for(engine, geometry);
-    if (!transform) return nullptr;
-    const std::lock_guard guard{guard_};
-    const std::uintptr_t key = next_;
-    held_.emplace(key, std::move(transform));
-    next_ += 2;
-    return reinterpret_cast<FftEnginePlan*>(key);  // NOLINT(performance-no-int-to-ptr): never followed
+    return transform ? held_.hold(std::move(transform)) : nullptr;
 }
 
-FftTransform* PlanStore::find(const FftEnginePlan* handle) const noexcept {
-    const std::lock_guard guard{guard_};
-    const auto found = held_.find(key_of(handle));
-    return found == held_.end() ? nullptr : found->second.get();
-}
-
-bool PlanStore::close(const FftEnginePlan* handle) noexcept {
-    const std::lock_guard guard{guard_};
-    return held_.erase(key_of(handle)) != 0;
-}
-
-std::size_t PlanStore::held() const noexcept {
-    const std::lock_guard guard{guard_};
-    return held_.size();
-}
+FftTransform* PlanStore::find(const FftEnginePlan* handle) const noexcept { return held_.find(handle).get(); }
 
 std::size_t PlanStore::kept() const noexcept {
     const std::lock_guard guard{guard_};

@@ -26,9 +26,7 @@ void read_product(const std::string& header, GeneralSAR& product) {
     refuse_header(header, QUO_OK, "holds no object of a product");
 }
 
-const GeneralSAR_Base& elements_of(GeneralSAR& product, GSObject object) {
-    return object == gsRoi ? product.roi.Roi : *product.GSget(object);
-}
+const GeneralSAR_Base& elements_of(GeneralSAR& product, GSObject object) { return *product.GSelements(object); }
 
 const char* section_of(GeneralSAR& product, GSObject object) {
     const parElement* element = elements_of(product, object).element(0);
@@ -37,11 +35,7 @@ const char* section_of(GeneralSAR& product, GSObject object) {
 
 const parElement* element_at(GeneralSAR& product, std::string_view field) {
     for (int i = gsRoi; i < GeneralSAR::kObjects; ++i) {
-        const GeneralSAR_Base& elements = elements_of(product, static_cast<GSObject>(i));
-        for (int k = 0; k < elements.elementCount(); ++k) {
-            const parElement& element = *elements.element(k);
-            if (field == std::string{element.section} + "/" + element.name) return &element;
-        }
+        if (const parElement* element = product.GSelement(static_cast<GSObject>(i), field)) return element;
     }
     return nullptr;
 }

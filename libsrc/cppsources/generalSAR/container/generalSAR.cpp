@@ -1,6 +1,7 @@
 #include "quo_base/generalSAR.h"
 
 #include <string>
+#include <string_view>
 
 #include "diagnosticslib/call_frame.h"
 #include "generalSAR/container/readable_file.h"
@@ -20,6 +21,12 @@ bool is_object(int object) { return object >= 0 && object < GeneralSAR::kObjects
 std::string side_file_of(const char* header) {
     const auto raster = quo::raster_of_header(quo::text_or_empty(header));
     return raster ? *raster + ".hdr" : "";
+}
+
+bool stands_at(std::string_view field, const parElement& element) {
+    const std::string_view section = element.section, name = element.name;
+    return field.size() == section.size() + 1 + name.size() && field.starts_with(section) &&
+           field[section.size()] == '/' && field.ends_with(name);
 }
 
 template <auto Object>
@@ -99,6 +106,20 @@ int GeneralSAR::GSwrite(const char* file) {
 
 GeneralSAR_Base* GeneralSAR::GSget(GSObject object) noexcept {
     return is_object(object) ? objects_[object] : nullptr;
+}
+
+const GeneralSAR_Base* GeneralSAR::GSelements(GSObject object) const noexcept {
+    if (!is_object(object)) return nullptr;
+    return object == gsRoi ? &roi.Roi : objects_[object];
+}
+
+const parElement* GeneralSAR::GSelement(GSObject object, std::string_view field) const noexcept {
+    const GeneralSAR_Base* const elements = GSelements(object);
+    for (int i = 0; elements && i < elements->elementCount(); ++i) {
+        const parElement* const element = elements->element(i);
+        if (stands_at(field, *element)) return element;
+    }
+    return nullptr;
 }
 
 int GeneralSAR::GSenable(GSObject object) noexcept {

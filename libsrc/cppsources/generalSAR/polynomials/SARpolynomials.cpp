@@ -2,12 +2,15 @@
 
 #include <algorithm>
 #include <array>
+#include <charconv>
 #include <cstddef>
 #include <iterator>
 #include <new>
 #include <optional>
 #include <span>
 #include <string>
+#include <string_view>
+#include <system_error>
 
 #include "diagnosticslib/call_frame.h"
 #include "profilelib/profile_look.h"
@@ -292,6 +295,23 @@ int extended_poly::EvaluatePoly(double rangeTime, double azimuthTime, double* va
 }
 
 QUO_RECORD(polySAR, counts::kTable)
+
+const poly* polySAR::polynomial(std::string_view name) const noexcept {
+    const std::size_t dash = std::min(name.rfind('-'), name.size());
+    const std::string_view quantity = name.substr(0, dash), number = name.substr(std::min(dash + 1, name.size()));
+    std::int32_t wanted = -1;
+    const auto [end, error] = std::from_chars(number.data(), number.data() + number.size(), wanted);
+    const bool padded = number.size() > 1 && number.front() == '0';
+    if (error != std::errc{} || end != number.data() + number.size() || wanted < 0 || padded) return nullptr;
+    const poly* found = nullptr;
+    each_list([&](std::size_t index, auto list, auto count) {
+        if (quantity == kQuantities[index].file_name &&
+            wanted < quo::PolynomialLists::held(*this, index, (this->*list).get(), this->*count))
+            found = &(this->*list)[static_cast<std::size_t>(wanted)];
+        return QUO_OK;
+    });
+    return found;
+}
 
 int polySAR::CreatePolys(int dc, int fr, int sl2gr, int gr2sl, int sl2theta, int sl2phi) {
     quo::CallFrame frame{"polySAR::CreatePolys", kSource};
