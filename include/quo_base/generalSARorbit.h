@@ -23,7 +23,7 @@
  * Results are 0 for success unless said otherwise; outputs are then written, and otherwise stay as they were.
  * Whatever needs a model returns 1 while there is none (no state vectors, or computeApproximateSV() has not yet
  * run since they were made), and 1 for an argument that is null or not finite. Every failure has its entry in the
- * report. One object serves one thread at a time. */
+ * report. One object serves one thread at a time, calls that are const apart. */
 
 namespace quo {
 class CallerFrame;
@@ -338,12 +338,13 @@ public:
     // output. Points without a solution are told by their status, not in the report.
 
     /** Ground points of samples.
-     * @return 0, also where samples have none; 1 without a model, for a missing array of azimuth or range times,
-     * for arrays that overlap or that no memory can hold. Nothing is written then. */
+     * @return 0, also where samples have none, or there are none; 1 without a model, for a missing array of
+     * azimuth or range times, for arrays that overlap or that no memory can hold. Nothing is written then. */
     int sat2earth(const OrbitSamples& samples, const OrbitGround& ground) const noexcept;
     /** When ground points are seen.
-     * @return 0, also where points are not; 1 without a model, for points that are not given in exactly one of the
-     * two forms, for arrays that overlap or that no memory can hold. Nothing is written then. */
+     * @return 0, also where points are not, or there are none; 1 without a model, for points that are not given in
+     * exactly one of the two forms, for arrays that overlap or that no memory can hold. Nothing is written then.
+     */
     int earth2sat(const OrbitTargets& targets, const OrbitSightings& seen) const noexcept;
 
     // --- geometry of a sample --------------------------------------------------------------------
