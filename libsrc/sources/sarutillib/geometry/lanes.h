@@ -260,8 +260,6 @@ template <class T>
 struct PackEllipsoid {
     T equatorial_m, polar_m;
 };
-template <class T>
-using EllipsoidOf = std::conditional_t<std::is_same_v<T, double>, Ellipsoid, PackEllipsoid<T>>;
 
 }  // namespace quo
 
