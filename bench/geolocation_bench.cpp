@@ -1,7 +1,11 @@
+#include <algorithm>
 #include <cstddef>
+#include <memory>
 #include <vector>
 
 #include "diagnosticslib/call_frame.h"
+#include "generalSAR/orbit/orbit_model.h"
+#include "geolocation_floor.h"
 #include "quo_base/interp_orb.h"
 #include "ratio_reporter.h"
 #include "sarutillib/geometry/geometry_kernels.h"
@@ -37,9 +41,9 @@ struct Bench {
             times.push_back(extent.first_s + line * (extent.last_s - extent.first_s));
             ranges.push_back(extent.near_s + column * (extent.far_s - extent.near_s));
             looks.push_back({ranges.back(), 0.0, orbit.getLambda(), 1.0});
-            double xyz[3];
-            orbit.sat2earth(times.back(), ranges.back(), xyz);
-            ground.push_back(quo::load(xyz));
+            double p[3];
+            orbit.sat2earth(times.back(), ranges.back(), p);
+            ground.push_back(quo::load(p));
         }
     }
     [[nodiscard]] quo::OrbitSegment segment() const { return {c[0], c[1], c[2]}; }
@@ -149,6 +153,144 @@ void geometry_call(benchmark::State& state) {
     });
 }
 
+// --- arrays -----------------------------------------------------------------------------------------------------
+
+/** The scene's points as arrays, a block of them, and room for the results. */
+struct Arrays {
+    std::vector<double> x, y, z;
+    std::vector<double> rows[10];
+    std::unique_ptr<quo::OrbitModel> model;
+    quo::OrbitView view;
+    quo::ForwardBlock samples{};
+    quo::InverseBlock points{};
+
+    explicit Arrays(const Bench& scene)
+        : model{quo::OrbitModel::create(scene.orbit.nSV_n)}, view{made_view(scene.orbit, *model)} {
+        for (auto& row : rows) row.resize(scene.times.size());
+        for (const quo::Vec3& p : scene.ground) {
+            x.push_back(p.x);
+            y.push_back(p.y);
+            z.push_back(p.z);
+        }
+        const auto middle = static_cast<std::ptrdiff_t>(x.size() / 2);
+        const auto take = [&](const std::vector<double>& from, double* to) {
+            std::copy_n(from.begin() + middle, quo::kBlockPoints, to);
+        };
+        take(scene.times, samples.t_s);
+        take(scene.ranges, samples.range_s);
+        take(x, points.x_m);
+        take(y, points.y_m);
+        take(z, points.z_m);
+    }
+    static quo::OrbitView made_view(const GeneralSAROrbit& orbit, quo::OrbitModel& model) {
+        model.build({orbit.pSV_m, orbit.vSV_mOs, orbit.nSV_n, orbit.dtSV_s}, orbit.t0SV_s);
+        return model.view(orbit.getLambda(), 1.0);
+    }
+};
+
+/** Runs `body` on many points at once; the time is that of one point. */
+template <typename Body>
+void all_points(benchmark::State& state, std::size_t count, Body body) {
+    Bench& scene = bench_scene();
+    static Arrays arrays{scene};
+    while (state.KeepRunningBatch(static_cast<benchmark::IterationCount>(count))) {
+        body(scene, arrays);
+        benchmark::ClobberMemory();
+    }
+}
+OrbitGround positions(Arrays& to) {
+    OrbitGround ground;
+    ground.x_m = to.rows[0].data();
+    ground.y_m = to.rows[1].data();
+    ground.z_m = to.rows[2].data();
+    return ground;
+}
+OrbitSamples samples_of(const Bench& s) { return {s.times.size(), s.times.data(), s.ranges.data()}; }
+void forward_array(benchmark::State& state) {
+    all_points(state, bench_scene().times.size(), [](Bench& s, Arrays& a) {
+        benchmark::DoNotOptimize(s.orbit.sat2earth(samples_of(s), positions(a)));
+    });
+}
+void height_array(benchmark::State& state) {
+    static const std::vector<double> heights(bench_scene().times.size(), 517.3);
+    all_points(state, heights.size(), [](Bench& s, Arrays& a) {
+        OrbitSamples samples = samples_of(s);
+        samples.height_m = heights.data();
+        benchmark::DoNotOptimize(s.orbit.sat2earth(samples, positions(a)));
+    });
+}
+void height_call(benchmark::State& state) {
+    double p[3];
+    each_point(state, [&](Bench& s, std::size_t i) {
+        benchmark::DoNotOptimize(s.orbit.sat2earth(s.times[i], s.ranges[i], 0.0, 517.3, p));
+        benchmark::DoNotOptimize(p);
+    });
+}
+void geometry_array(benchmark::State& state) {
+    all_points(state, bench_scene().times.size(), [](Bench& s, Arrays& a) {
+        OrbitGround ground = positions(a);
+        ground.latitude_deg = a.rows[3].data();
+        ground.longitude_deg = a.rows[4].data();
+        ground.incidence_deg = a.rows[5].data();
+        ground.look_deg = a.rows[6].data();
+        ground.fm_rate_hz_s = a.rows[7].data();
+        ground.speed_m_s = a.rows[8].data();
+        benchmark::DoNotOptimize(s.orbit.sat2earth(samples_of(s), ground));
+    });
+}
+void inverse_array(benchmark::State& state) {
+    all_points(state, bench_scene().times.size(), [](Bench& s, Arrays& a) {
+        OrbitTargets targets{s.times.size()};
+        targets.x_m = a.x.data();
+        targets.y_m = a.y.data();
+        targets.z_m = a.z.data();
+        benchmark::DoNotOptimize(s.orbit.earth2sat(targets, {a.rows[0].data(), a.rows[1].data(), nullptr}));
+    });
+}
+
+/** The kernels alone on one block, which stays in the first cache. */
+template <int width>
+void forward_lanes(benchmark::State& state) {
+    all_points(state, quo::kBlockPoints, [](Bench&, Arrays& a) {
+        benchmark::DoNotOptimize(quo::array_kernels(width).forward(a.view, quo::kBlockPoints, a.samples));
+    });
+}
+template <int width>
+void inverse_lanes(benchmark::State& state) {
+    all_points(state, quo::kBlockPoints, [](Bench&, Arrays& a) {
+        benchmark::DoNotOptimize(quo::array_kernels(width).inverse(a.view, quo::kBlockPoints, a.points));
+    });
+}
+
+/** The operations of a point to the ground in three steps of Newton's method, and of one back in as many, a root
+ * counted as a division. */
+constexpr bench::Operations kForwardOperations{160, 110, 16}, kInverseOperations{195, 150, 7};
+
+/** What they take where none waits for another. */
+template <int width>
+void arithmetic(benchmark::State& state, const bench::Operations& operations) {
+    while (state.KeepRunningBatch(width)) {
+        (width == 4 ? bench::operate_4 : bench::operate_8)(operations);
+        benchmark::ClobberMemory();
+    }
+}
+template <int width>
+void add_width(const char* forward, const char* inverse) {
+    if (quo::array_kernels(width).width != width) return;
+    benchmark::RegisterBenchmark(forward, arithmetic<width>, kForwardOperations);
+    benchmark::RegisterBenchmark(inverse, arithmetic<width>, kInverseOperations);
+}
+BENCHMARK(forward_array);
+BENCHMARK(height_array);
+BENCHMARK(height_call);
+BENCHMARK(geometry_array);
+BENCHMARK(inverse_array);
+BENCHMARK(forward_lanes<2>)->Name("forward_lanes_2");
+BENCHMARK(forward_lanes<4>)->Name("forward_lanes_4");
+BENCHMARK(forward_lanes<8>)->Name("forward_lanes_8");
+BENCHMARK(inverse_lanes<2>)->Name("inverse_lanes_2");
+BENCHMARK(inverse_lanes<4>)->Name("inverse_lanes_4");
+BENCHMARK(inverse_lanes<8>)->Name("inverse_lanes_8");
 BENCHMARK(two_frames);
 BENCHMARK(orbit_kernel);
 BENCHMARK(orbit_calls);
@@ -165,15 +307,28 @@ BENCHMARK(geometry_call);
 }  // namespace
 
 int main(int argc, char** argv) {
-    return bench::run(argc, argv,
-                      {
-                          {"SVGetPos + SVGetVel / polynomials", "orbit_calls", "orbit_kernel", 5.0},
-                          {"SVGetPos + SVGetVel / two frames", "orbit_calls", "two_frames", 10.0},
-                          {"sat2earth / kernel", "forward_call", "forward_kernel", 1.3},
-                          {"earth2sat / kernel", "inverse_call", "inverse_kernel", 1.3},
-                          {"earth2satPrecise / kernel", "precise_call", "inverse_kernel", 2.5},
-                          {"earth2satLinear / earth2sat", "linear_call", "inverse_call", 0.5},
-                          {"SVGetLatLon / sat2earth", "lat_lon_call", "forward_call", 1.7},
-                          {"SVGetGeometry / sat2earth", "geometry_call", "forward_call", 2.6},
-                      });
+    add_width<4>("forward_arithmetic_4", "inverse_arithmetic_4");
+    add_width<8>("forward_arithmetic_8", "inverse_arithmetic_8");
+    return bench::run(
+        argc, argv,
+        {
+            {"SVGetPos + SVGetVel / polynomials", "orbit_calls", "orbit_kernel", 5.0},
+            {"SVGetPos + SVGetVel / two frames", "orbit_calls", "two_frames", 10.0},
+            {"sat2earth / kernel", "forward_call", "forward_kernel", 1.3},
+            {"earth2sat / kernel", "inverse_call", "inverse_kernel", 1.3},
+            {"earth2satPrecise / kernel", "precise_call", "inverse_kernel", 2.5},
+            {"earth2satLinear / earth2sat", "linear_call", "inverse_call", 0.5},
+            {"SVGetLatLon / sat2earth", "lat_lon_call", "forward_call", 1.7},
+            {"SVGetGeometry / sat2earth", "geometry_call", "forward_call", 2.6},
+            {"array: sat2earth / single", "forward_array", "forward_call", 0.14},
+            {"array: the same at a height", "height_array", "height_call", 0.14},
+            {"array: all of the geometry / single", "geometry_array", "geometry_call", 0.2},
+            {"array: earth2sat / single", "inverse_array", "inverse_call", 0.25},
+            {"kernel, AVX2: sat2earth / single", "forward_lanes_4", "forward_call", 0.18},
+            {"kernel, AVX2: earth2sat / single", "inverse_lanes_4", "inverse_call", 0.36},
+            {"kernel, AVX2: sat2earth / arithmetic", "forward_lanes_4", "forward_arithmetic_4", 1.6},
+            {"kernel, AVX2: earth2sat / arithmetic", "inverse_lanes_4", "inverse_arithmetic_4", 1.6},
+            {"kernel, AVX-512: sat2earth / arithmetic", "forward_lanes_8", "forward_arithmetic_8", 1.6},
+            {"kernel, AVX-512: earth2sat / arithmetic", "inverse_lanes_8", "inverse_arithmetic_8", 1.6},
+        });
 }

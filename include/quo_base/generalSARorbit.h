@@ -336,15 +336,17 @@ public:
     // side by side on any number of threads, as long as nobody calls anything else of it that is not const.
     //
     // An output may be the very array of an input, but must not overlap with one otherwise, nor with another
-    // output. Points without a solution are told by their status, not in the report.
+    // output. Points without a solution are told by their status, not in the report; a call that is refused makes
+    // its entry, which is not for several threads at once.
 
     /** Ground points of samples.
-     * @return 0, also where samples have none; 1 without a model, for a missing array of azimuth or range times,
-     * for arrays that overlap or that no memory can hold. Nothing is written then. */
+     * @return 0, also where samples have none, or there are none; 1 without a model, for a missing array of
+     * azimuth or range times, for arrays that overlap or that no memory can hold. Nothing is written then. */
     int sat2earth(const OrbitSamples& samples, const OrbitGround& ground) const noexcept;
     /** When ground points are seen.
-     * @return 0, also where points are not; 1 without a model, for points that are not given in exactly one of the
-     * two forms, for arrays that overlap or that no memory can hold. Nothing is written then. */
+     * @return 0, also where points are not, or there are none; 1 without a model, for points that are not given in
+     * exactly one of the two forms, for arrays that overlap or that no memory can hold. Nothing is written then.
+     */
     int earth2sat(const OrbitTargets& targets, const OrbitSightings& seen) const noexcept;
 
     // --- geometry of a sample --------------------------------------------------------------------

@@ -87,8 +87,10 @@ int single(GeneralSAROrbit& orbit, const Arrays& made, std::size_t i, double (&o
 
 void expect_as_alone(GeneralSAROrbit& orbit, double height_m, std::size_t count, double least_solved) {
     Arrays made = samples_of(orbit, height_m, count);
+    ASSERT_EQ(orbit.updatePolys(orbit.t0SV_s), 0);  // which arrays do not look at
     ASSERT_EQ(orbit.sat2earth(made.samples(), made.ground()), 0);
     ASSERT_EQ(orbit.earth2sat(made.targets(), made.sightings()), 0);
+    EXPECT_EQ(errno, 0);
     const double end = orbit.t0SV_s + (orbit.nSV_n - 1) * orbit.dtSV_s;
     std::size_t ground = 0, seen = 0;
     for (std::size_t i = 0; i < count; ++i) {

@@ -1,4 +1,5 @@
 #include <algorithm>
+#include <cerrno>
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
@@ -11,16 +12,36 @@
 #include "quo_base/generalSARorbit.h"
 
 // Arrays go through blocks of their own: a block's inputs are all read before its outputs are written, so that an
-// output may take the place of an input.
+// output may take the place of an input. What is not refused opens no frame and enters nothing in the report, both
+// of which are the process's: calls may run side by side.
 
 namespace {
 
 using Obj = GeneralSAROrbit;
 constexpr const char* kSource = "generalSARorbit";
 constexpr const char* kNoModel = "There are no state vectors, or no model through them";
+constexpr const char* kForward = "GeneralSAROrbit::sat2earth";
+constexpr const char* kInverse = "GeneralSAROrbit::earth2sat";
 constexpr const char* kMissing = "An array is missing, or points are given twice";
 constexpr const char* kBadArrays = "Arrays overlap, or no memory can hold them";
 constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
+
+int refuse(const char* call, const char* message, int line = __builtin_LINE()) noexcept {
+    quo::CallFrame frame{call, kSource, line};
+    return frame.fail(QUO_REFUSED, message, line);
+}
+
+/** Leaves errno as it was: where a speed does not allow a Doppler, the first guess draws the root of a negative
+ * number. */
+class ErrnoKept {
+public:
+    ErrnoKept() noexcept = default;
+    ~ErrnoKept() { errno = before_; }
+    ErrnoKept(ErrnoKept&&) = delete;
+
+private:
+    int before_ = errno;
+};
 
 // --- The arrays of a call ---------------------------------------------------------------------------------------
 
@@ -183,14 +204,14 @@ int solve_target(const quo::OrbitModel& model, const quo::OrbitView& view, quo::
 }  // namespace
 
 int Obj::sat2earth(const OrbitSamples& samples, const OrbitGround& ground) const noexcept {
-    quo::CallFrame frame{"GeneralSAROrbit::sat2earth", kSource};
-    if (!modelReady()) return frame.fail(QUO_REFUSED, kNoModel);
-    if (samples.count > 0 && (!samples.azimuth_s || !samples.range_s)) return frame.fail(QUO_REFUSED, kMissing);
+    if (!modelReady()) return refuse(kForward, kNoModel);
+    if (samples.count > 0 && (!samples.azimuth_s || !samples.range_s)) return refuse(kForward, kMissing);
     const double* const inputs[] = {samples.azimuth_s, samples.range_s, samples.doppler_hz, samples.height_m};
     double* outputs[quo::kGroundValues];
     std::ranges::transform(kGroundArrays, outputs, [&](const GroundArray& a) { return ground.*a.array; });
-    if (!lie_well(inputs, outputs, ground.status, samples.count)) return frame.fail(QUO_REFUSED, kBadArrays);
+    if (!lie_well(inputs, outputs, ground.status, samples.count)) return refuse(kForward, kBadArrays);
 
+    const ErrnoKept kept;
     const quo::OrbitModel& model = *model_;
     const quo::OrbitView view = model.view(lambda_, static_cast<double>(look_sign_));
     const quo::ArrayKernels& kernels = quo::array_kernels();
@@ -210,19 +231,19 @@ int Obj::sat2earth(const OrbitSamples& samples, const OrbitGround& ground) const
                    [&](int i) { return solve_sample(model, view, block, i); });
         for (const auto& [array, row] : kGroundArrays) piece.write(block.result[row], ground.*array);
     });
-    return frame.success();
+    return QUO_OK;
 }
 
 int Obj::earth2sat(const OrbitTargets& targets, const OrbitSightings& seen) const noexcept {
-    quo::CallFrame frame{"GeneralSAROrbit::earth2sat", kSource};
-    if (!modelReady()) return frame.fail(QUO_REFUSED, kNoModel);
+    if (!modelReady()) return refuse(kInverse, kNoModel);
     const Given form = given_form(targets);
-    if (targets.count > 0 && form == Given::kNothing) return frame.fail(QUO_REFUSED, kMissing);
+    if (targets.count > 0 && form == Given::kNothing) return refuse(kInverse, kMissing);
     const double* const inputs[] = {targets.latitude_deg, targets.longitude_deg, targets.height_m,  targets.x_m,
                                     targets.y_m,          targets.z_m,           targets.doppler_hz};
     double* const outputs[] = {seen.azimuth_s, seen.range_s};
-    if (!lie_well(inputs, outputs, seen.status, targets.count)) return frame.fail(QUO_REFUSED, kBadArrays);
+    if (!lie_well(inputs, outputs, seen.status, targets.count)) return refuse(kInverse, kBadArrays);
 
+    const ErrnoKept kept;
     const quo::OrbitModel& model = *model_;
     const quo::OrbitView view = model.view(lambda_, static_cast<double>(look_sign_));
     const quo::ArrayKernels& kernels = quo::array_kernels();
@@ -238,5 +259,5 @@ int Obj::earth2sat(const OrbitTargets& targets, const OrbitSightings& seen) cons
         piece.write(block.t_s, seen.azimuth_s);
         piece.write(block.range_s, seen.range_s);
     });
-    return frame.success();
+    return QUO_OK;
 }

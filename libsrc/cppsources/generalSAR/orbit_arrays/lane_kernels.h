@@ -87,7 +87,7 @@ struct LaneKernels {
     QUO_LANES_INLINE static void place(const ForwardBlock& block, int i, const Run& run, T u,
                                        Sample& sample) noexcept {
         sample.open = magnitude(load(block.t_s + i)) <= kMost;
-        sample.solved = but_not(sample.open, sample.open);
+        sample.solved = Mask{};
         sample.P = V{};
         sample.S = orbit_position(run.curve(), u);
         sample.velocity = orbit_velocity(run.curve(), u);
@@ -235,12 +235,12 @@ struct LaneKernels {
                 open = open || any(samples[i].open);
             }
         }
-        Mask all = T{} == T{};
+        auto solved = everywhere<Mask>();
         for (int i = 0; i < packs; ++i) {
             tell(orbit, block, i * kWidth, samples[i]);
-            all = both(all, samples[i].solved);
+            solved = both(solved, samples[i].solved);
         }
-        return !any(but_not(T{} == T{}, all));
+        return all(solved);
     }
 
     static bool forward(const OrbitView& orbit, int count, ForwardBlock& block) noexcept {
@@ -257,7 +257,7 @@ struct LaneKernels {
         const T at_hand = fresh.chord.time_of(P - fresh.start(), rate, kFirstRoot);
         const Mask near = is_at_hand(orbit.times, at_hand);
         const T here = (orbit.fresh.start_s - orbit.times.first_s) + at_hand;
-        if (!any(but_not(T{} == T{}, near))) return here;
+        if (all(near)) return here;
 
         const V first = spread(orbit.runs[0]).start();
         const T coarse = spread(orbit.mean).time_of(P - first, rate, kFirstRoot) / spacing;
@@ -289,7 +289,7 @@ struct LaneKernels {
         search.rate_m_s = select(known, asked_rate, T{});
         const T since_first = first_guess(orbit, search.P, search.rate_m_s);
         search.open = both(known, magnitude(since_first) <= kMost);
-        search.found = but_not(known, known);
+        search.found = Mask{};
         search.guess_s = orbit.times.first_s + select(search.open, since_first, T{});
         search.in_use = next_run(orbit.times, spread(orbit.fresh), search.guess_s);
         search.t_s = search.range_s = T{};
@@ -346,21 +346,21 @@ struct LaneKernels {
         // A guess at the edge of a run's middle leads out of it, where another run serves: once more there.
         for (int round = 0; round < 2; ++round) {
             find_times(orbit, searches, packs);
-            Mask open = T{} != T{};
+            Mask open{};
             for (int i = 0; i < packs; ++i) {
                 end(orbit, searches[i]);
                 open = either(open, searches[i].open);
             }
             if (!any(open)) break;
         }
-        Mask all = T{} == T{};
+        auto solved = everywhere<Mask>();
         for (int i = 0; i < packs; ++i) {
             save(searches[i].t_s, block.t_s + i * kWidth);
             save(searches[i].range_s, block.range_s + i * kWidth);
             save(searches[i].found, block.solved + i * kWidth);
-            all = both(all, searches[i].found);
+            solved = both(solved, searches[i].found);
         }
-        return !any(but_not(T{} == T{}, all));
+        return all(solved);
     }
 
     static constexpr ArrayKernels kTable{kWidth, forward, inverse};

@@ -78,7 +78,7 @@ QUO_LANES_INLINE GeodeticNormal<NumberOf<V>> geodetic_normal(const V& p, double 
     const double flat = a * a - b * b;
     T c = b * axis_distance, s = a * p.z;  // parametric latitude's cosine and sine, up to a factor
     T out = axis_distance, up = p.z;       // the normal's
-    MaskOf<T> open = c == c;
+    auto open = everywhere<MaskOf<T>>();
     for (int round = 0; round < kRounds && any(open); ++round) {
         const T length = at_least(root(c * c + s * s), least);
         const T unit_c = c / length, unit_s = s / length;
@@ -214,7 +214,7 @@ QUO_LANES_INLINE CrossingOf<NumberOf<V>> begin_crossing(const LookCircleOf<V>& c
     const T first = (circle.base_m2 + a2 - nadir2) / -circle.swing_m2;
     const MaskOf<T> crosses = both(asked, magnitude(first) < 1.0);
     const T c = select(crosses, first, T{});
-    return {{c, root(1.0 - c * c)}, crosses, but_not(asked, asked)};
+    return {{c, root(1.0 - c * c)}, crosses, MaskOf<T>{}};
 }
 
 template <class V>
@@ -304,7 +304,7 @@ struct TimeSearchOf {
 
     /** From a start, where `asked` holds. */
     QUO_LANES_INLINE static TimeSearchOf begin(T start_s, MaskOf<T> asked) noexcept {
-        return {start_s, T{}, T{}, asked, asked, but_not(asked, asked)};
+        return {start_s, T{}, T{}, asked, asked, MaskOf<T>{}};
     }
     template <class V>
     QUO_LANES_INLINE void step(const SegmentOf<T>& orbit, const V& P, const TimeSpanOf<T>& span,

@@ -43,6 +43,14 @@ inline constexpr double kMost = std::numeric_limits<double>::max(), kLeast = std
 
 // --- Masks ------------------------------------------------------------------------------------------------------
 
+/** True in every lane. */
+template <class M>
+QUO_LANES_INLINE M everywhere() noexcept {
+    if constexpr (std::is_same_v<M, bool>)
+        return true;
+    else
+        return ~M{};
+}
 template <class M>
 QUO_LANES_INLINE M both(M a, M b) noexcept {
     if constexpr (std::is_same_v<M, bool>)
@@ -94,6 +102,11 @@ QUO_LANES_INLINE unsigned bits_of(M mask) noexcept {
 template <class M>
 QUO_LANES_INLINE bool any(M mask) noexcept {
     return bits_of(mask) != 0;
+}
+
+template <class M>
+QUO_LANES_INLINE bool all(M mask) noexcept {
+    return !any(but_not(everywhere<M>(), mask));
 }
 
 // --- Numbers ----------------------------------------------------------------------------------------------------
@@ -247,8 +260,6 @@ template <class T>
 struct PackEllipsoid {
     T equatorial_m, polar_m;
 };
-template <class T>
-using EllipsoidOf = std::conditional_t<std::is_same_v<T, double>, Ellipsoid, PackEllipsoid<T>>;
 
 }  // namespace quo
 

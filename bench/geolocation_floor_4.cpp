@@ -1,0 +1,3 @@
+#define QUO_BENCH_LANES 4
+#define QUO_BENCH_OPERATE operate_4
+#include "geolocation_floor.inc"
