@@ -131,25 +131,35 @@ struct OrbitSamples {
 /** What is wanted of the samples' ground points: arrays for as many numbers, null where one is not wanted. A
  * sample without a ground point gets not-a-number in all of them. Quantities as in GrPtGeometry. */
 struct OrbitGround {
-    double *latitude_deg{}, *longitude_deg{}, *height_m{};  ///< geodetic place
-    double *x_m{}, *y_m{}, *z_m{};                          ///< the same, Earth-fixed
-    double *incidence_deg{}, *look_deg{};                   ///< angles at the target and at the platform
-    double *fm_rate_hz_s{}, *speed_m_s{};                   ///< azimuth FM rate, platform speed
-    std::int32_t* status{};                                 ///< what the call for the one sample returns
+    double* latitude_deg{};   ///< geodetic place
+    double* longitude_deg{};  ///< -180 to 180
+    double* height_m{};       ///< above the ellipsoid
+    double* x_m{};            ///< the same place, Earth-fixed
+    double* y_m{};            ///< with x_m
+    double* z_m{};            ///< with x_m
+    double* incidence_deg{};  ///< at the target
+    double* look_deg{};       ///< at the platform
+    double* fm_rate_hz_s{};   ///< azimuth FM rate
+    double* speed_m_s{};      ///< of the platform
+    std::int32_t* status{};   ///< what the call for the one sample returns
 };
 /** Ground points for GeneralSAROrbit::earth2sat(): arrays of `count` numbers each, latitude and longitude or x, y
  * and z. */
 struct OrbitTargets {
-    std::size_t count;                               ///< of the points, and so of every array
-    const double *latitude_deg{}, *longitude_deg{};  ///< geodetic
-    const double* height_m{};                        ///< above the ellipsoid; null for 0
-    const double *x_m{}, *y_m{}, *z_m{};             ///< Earth-fixed, in place of the three above
-    const double* doppler_hz{};                      ///< null for Doppler 0
+    std::size_t count;              ///< of the points, and so of every array
+    const double* latitude_deg{};   ///< geodetic
+    const double* longitude_deg{};  ///< with latitude_deg
+    const double* height_m{};       ///< above the ellipsoid, with latitude_deg; null for 0
+    const double* x_m{};            ///< Earth-fixed, in place of the three above
+    const double* y_m{};            ///< with x_m
+    const double* z_m{};            ///< with x_m
+    const double* doppler_hz{};     ///< null for Doppler 0
 };
 /** What is wanted of them; null where it is not. A point that is not seen gets not-a-number. */
 struct OrbitSightings {
-    double *azimuth_s{}, *range_s{};  ///< azimuth time and two-way range time
-    std::int32_t* status{};           ///< what the call for the one point returns
+    double* azimuth_s{};     ///< azimuth times
+    double* range_s{};       ///< two-way range times
+    std::int32_t* status{};  ///< what the call for the one point returns
 };
 
 /** The orbit model: a degree-4 polynomial through every run of five state vectors, and geolocation on it.
