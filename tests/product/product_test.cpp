@@ -303,8 +303,8 @@ TEST(Product, RefusesWithNothingWrittenAndAnEntry) {
         EXPECT_EQ(std::memcmp(&outputs, &before, sizeof outputs), 0) << name;
         EXPECT_GT(report.text().size(), entries) << name;
     };
-    for (const auto& [name, status, call] : kRefusals)
-        expect_refusal(name, status, [&] { return call(whole.get(), bare.get(), outputs); });
+    for (const auto& row : kRefusals)
+        expect_refusal(row.name, row.status, [&] { return row.call(whole.get(), bare.get(), outputs); });
     for (quo_product* const none :
          {closed, reinterpret_cast<quo_product*>(&outputs), static_cast<quo_product*>(nullptr)}) {
         expect_refusal("close", 1, [&] { return quo_product_close(none); });

@@ -240,7 +240,7 @@ TEST_F(Threads, ShareAProductUntilItIsClosed) {
     ASSERT_EQ(quo_product_open(test::kScenes[0].path(".xml").c_str(), name.c_str(), &product), 0);
     side_by_side([&](int thread) {
         const double t = 1167930360.0, range = 0.0054, same = 12.5;
-        for (int round = 0; round < 100; ++round) {
+        for (int round = 0, refused = 0; refused < 3; ++round) {
             double first_s = same, longitude = same, sample = same;
             const int status[] = {
                 quo_product_number(product, "StateVectorData/t0SV_s", &first_s),
@@ -250,9 +250,9 @@ TEST_F(Threads, ShareAProductUntilItIsClosed) {
             EXPECT_EQ(first_s, status[0] ? same : 1167930296.781409);
             EXPECT_NEAR(longitude, status[1] ? same : 11.68, 0.5);
             EXPECT_EQ(sample, status[2] ? same : test::part_value(3, thread, 0));
-            if (thread != 0 || round > 50) continue;
-            EXPECT_EQ(std::to_array(status), (std::array{0, 0, 0}));
-            if (round == 50) {
+            refused = status[0] + status[1] + status[2];
+            if (thread == 0 && round == 50) {
+                EXPECT_EQ(refused, 0);
                 EXPECT_EQ(quo_product_close(product), 0);
             }
         }
