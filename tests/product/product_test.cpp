@@ -14,7 +14,7 @@
 #include <tuple>
 #include <vector>
 
-#include "objects/products.h"
+#include "objects/records.h"
 #include "support/diagnostics.h"
 #include "support/raster.h"
 #include "support/scenes.h"
