@@ -158,7 +158,14 @@ int RasterDescription::commitPair(quo::AtomicFile& raster, const char* side_file
     if (const int status = writeSection(side_file)) return status;
     quo::AtomicFile side{side_file};
     if (!side.good()) return QUO_NOT_OPENED;
-    if (!session.save(side) || !quo::commit_pair(raster, side)) return QUO_WRITE_FAILED;
+    // A process that is killed in between leaves a raster that is at least as long as its description says.
+    const std::string_view raster_name =
+        quo::text_or_empty(side_file);  // but for the ending, as side_file_of() has it
+    const auto old_bytes = quo::file_length(std::string{raster_name.substr(0, raster_name.rfind('.'))}.c_str());
+    errno = 0;
+    const bool shrinks = old_bytes && *old_bytes > rasterSize();
+    if (!session.save(side)) return QUO_WRITE_FAILED;
+    if (!(shrinks ? quo::commit_pair(side, raster) : quo::commit_pair(raster, side))) return QUO_WRITE_FAILED;
     for (const quo::AtomicFile* file : {&raster, &side})
         quo::warn_if_in_place(*file, "RasterDescription::commitPair", kSource);
     return QUO_OK;

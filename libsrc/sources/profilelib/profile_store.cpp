@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <cstdio>
 #include <mutex>
+#include <type_traits>
 #include <utility>
 
 #include "diagnosticslib/saved_in_place.h"
@@ -124,8 +125,9 @@ void ProfileStore::keep(std::string_view path) {
 }
 
 std::unique_lock<std::recursive_mutex> profile_access() noexcept {
-    // Recursive, since accessors call each other; never destroyed, as the store.
-    static auto& lock = *new std::recursive_mutex;
+    // Recursive, since accessors call each other. It has nothing to destroy: the store is used to the very end.
+    static std::recursive_mutex lock;
+    static_assert(std::is_trivially_destructible_v<std::recursive_mutex>);
     return std::unique_lock{lock};
 }
 
