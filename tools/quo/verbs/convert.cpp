@@ -2,6 +2,7 @@
 #include <complex>
 #include <memory>
 #include <optional>
+#include <utility>
 #include <variant>
 #include <vector>
 
@@ -151,8 +152,9 @@ private:
             return *tile++;
         };
         const auto make_worker = [&] {
-            return [own = std::make_unique<TileReader>(options_.in, in_.description(), wanted_, scaling_, lines_,
-                                                       samples_)](const Tile& part) { return own->read(part); };
+            auto own =
+                std::make_unique<TileReader>(options_.in, in_.description(), wanted_, scaling_, lines_, samples_);
+            return [own = std::move(own)](const Tile& part) { return own->read(part); };
         };
         blocks::in_order(options_.threads, next, make_worker, [&](const Converted& part) {
             write(part);
