@@ -5,6 +5,7 @@
 #include <memory>
 #include <optional>
 #include <span>
+#include <utility>
 
 #include "apart.h"
 #include "commands.h"
@@ -73,13 +74,14 @@ public:
             if (begun == rows()) return std::nullopt;
             return begun++;
         };
-        const auto make_band = [&] { return std::make_unique<Band>(*this, name, raster); };
-        blocks::in_order(
-            threads, next, [&] { return [band = make_band()](std::int64_t row) { return band->add(row); }; },
-            [&](bool has_power) {
-                has_power_ |= has_power;
-                progress.step(++done * bytes, rows() * bytes);
-            });
+        const auto make_worker = [&] {
+            auto band = std::make_unique<Band>(*this, name, raster);
+            return [band = std::move(band)](std::int64_t row) { return band->add(row); };
+        };
+        blocks::in_order(threads, next, make_worker, [&](bool has_power) {
+            has_power_ |= has_power;
+            progress.step(++done * bytes, rows() * bytes);
+        });
     }
 
     [[nodiscard]] std::size_t width() const { return width_; }

@@ -4,6 +4,7 @@
 #include <memory>
 #include <numbers>
 #include <optional>
+#include <utility>
 
 #include "apart.h"
 #include "commands.h"
@@ -205,8 +206,8 @@ private:
         Progress progress{options_.waitbar ? "Resampling" : nullptr};
         std::int64_t done = 0;
         const auto make_worker = [&] {
-            return [own = std::make_unique<PartResampler>(options_.in, in_, from, into, options_.centre)](
-                       const Part& part) { return own->run(part); };
+            auto own = std::make_unique<PartResampler>(options_.in, in_, from, into, options_.centre);
+            return [own = std::move(own)](const Part& part) { return own->run(part); };
         };
         const std::int64_t bytes = to().element_sizeof();
         blocks::in_order(options_.threads, next, make_worker, [&](const Resampled& part) {

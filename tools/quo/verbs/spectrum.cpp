@@ -7,6 +7,7 @@
 #include <nlohmann/json.hpp>
 #include <numbers>
 #include <optional>
+#include <utility>
 
 #include "apart.h"
 #include "commands.h"
@@ -120,9 +121,8 @@ public:
             return *tile++;
         };
         const auto make_worker = [&] {
-            return [own = std::make_unique<Segments>(name, description, lines_, samples_)](const Tile& segment) {
-                return own->look_at(segment);
-            };
+            auto own = std::make_unique<Segments>(name, description, lines_, samples_);
+            return [own = std::move(own)](const Tile& segment) { return own->look_at(segment); };
         };
         blocks::in_order(threads, next, make_worker, [&](const SegmentPower& power) {
             std::ranges::transform(range_, power.range, range_.begin(), std::plus{});
