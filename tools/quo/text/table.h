@@ -53,14 +53,12 @@ struct Rows {
     std::vector<Line> lines;
     std::int64_t bytes_read = 0;  ///< of the input, up to the last of them
 
-    /** Calls visit(row) for each. */
+    /** Calls visit(text, number in the file) for each line. */
     template <typename Visit>
-    void each(Visit visit) const {
-        Row row;
+    void each_line(Visit visit) const {
         std::size_t begin = 0;
         for (const Line& line : lines) {
-            row.take(std::string_view{text}.substr(begin, line.end - begin), line.number);
-            visit(row);
+            visit(std::string_view{text}.substr(begin, line.end - begin), line.number);
             begin = line.end;
         }
     }

@@ -242,8 +242,9 @@ private:
         points_.resize(rows.lines.size());
         defects_.clear();
         std::size_t i = 0;
-        rows.each([&](const Row& row) {
-            defects_.push_back(columns_->read(row, points_, i));
+        rows.each_line([&](std::string_view line, std::int64_t number) {
+            row_.take(line, number);
+            defects_.push_back(columns_->read(row_, points_, i));
             if (defects_.back()) clear(i);
             ++i;
         });
@@ -255,19 +256,28 @@ private:
     }
     void write(const Rows& rows, Solved& solved) {
         std::size_t i = 0;
-        rows.each([&](const Row& row) {
+        rows.each_line([&](std::string_view line, std::int64_t number) {
             auto& cause = defects_[i];
             const int status = cause ? QUO_REFUSED : points_.status[i];
+            append_row(solved.text, line, number, cause.has_value());
             if (!cause && status != 0) cause = "status " + status_text(status);
-            append_row(solved.text, row, columns_->count());
             for (std::size_t k = 0; k < direction_->outputs.size(); ++k) {
                 solved.text += ',';
                 if (status == 0) append_exact(solved.text, points_.out[k][i]);
             }
-            solved.text += "," + std::to_string(status) + "\n";
-            if (cause) solved.complaints.push_back({row.number(), std::move(*cause)});
+            solved.text += status == 0 ? ",0\n" : "," + std::to_string(status) + "\n";
+            if (cause) solved.complaints.push_back({number, std::move(*cause)});
             ++i;
         });
+    }
+    /** A row without a defect has as many fields as there are columns. */
+    void append_row(std::string& text, std::string_view line, std::int64_t number, bool defect) {
+        if (!defect) {
+            text += line;
+            return;
+        }
+        row_.take(line, number);
+        tool::append_row(text, row_, columns_->count());
     }
 
     const Scene* scene_;
@@ -276,6 +286,7 @@ private:
     std::unique_ptr<GeneralSAROrbit> loaded_ = std::make_unique<GeneralSAROrbit>(),
                                      own_ = std::make_unique<GeneralSAROrbit>();
     Points points_;
+    Row row_;
     std::vector<std::optional<std::string>> defects_;  // of each row
 };
 
