@@ -7,6 +7,7 @@
 #include <exception>
 #include <mutex>
 #include <optional>
+#include <system_error>
 #include <thread>
 #include <utility>
 #include <vector>
@@ -109,7 +110,11 @@ void in_order(int threads, Next next, MakeWorker make_worker, HandOn hand_on) {
     };
     {
         std::vector<std::jthread> others;
-        for (std::size_t i = 1; i < workers.size(); ++i) others.emplace_back([&, i] { work(workers[i]); });
+        try {
+            for (std::size_t i = 1; i < workers.size(); ++i) others.emplace_back([&, i] { work(workers[i]); });
+        } catch (const std::system_error&) {
+            // The system has no more threads: those that there are do the work.
+        }
         work(workers.front());
     }
     turns.rethrow();

@@ -158,10 +158,10 @@ int RasterDescription::commitPair(quo::AtomicFile& raster, const char* side_file
     if (const int status = writeSection(side_file)) return status;
     quo::AtomicFile side{side_file};
     if (!side.good()) return QUO_NOT_OPENED;
-    // A process that is killed in between leaves a raster that is at least as long as its description says.
-    const std::string_view raster_name =
-        quo::text_or_empty(side_file);  // but for the ending, as side_file_of() has it
-    const auto old_bytes = quo::file_length(std::string{raster_name.substr(0, raster_name.rfind('.'))}.c_str());
+    // A process that is killed in between leaves a raster that is at least as long as its description says. The
+    // side file's name is the raster's and an ending.
+    const std::string_view side_name = quo::text_or_empty(side_file);
+    const auto old_bytes = quo::file_length(std::string{side_name.substr(0, side_name.rfind('.'))}.c_str());
     errno = 0;
     const bool shrinks = old_bytes && *old_bytes > rasterSize();
     if (!session.save(side)) return QUO_WRITE_FAILED;
