@@ -14,6 +14,7 @@
 #include "quo_base/geometry.h"
 #include "quo_base/gr_pt.h"
 #include "quo_base/interp_orb.h"
+#include "quo_base/mission_import.h"
 #include "quo_base/product.h"
 #include "quo_base/profile.h"
 
@@ -27,6 +28,7 @@
 #include "quo_base/generalSAR_configuration.h"
 #include "quo_base/generalSARorbit.h"
 #include "quo_base/geo_grid.h"
+#include "quo_base/image_grid.h"
 #include "quo_base/interp.h"
 #include "quo_base/quorelReport.h"
 #include "quo_base/quorelxml_v2.h"

@@ -74,6 +74,8 @@ public:
     }
     /** Saves what was written, unless that is left to the session that was open already. */
     [[nodiscard]] int commit() { return own_ ? own_->commit() : QUO_OK; }
+    /** See HeaderSession::save; of a session that was open already everything that was written into it so far. */
+    [[nodiscard]] bool save(AtomicFile& file) { return session_->save(file); }
     /** See HeaderSession::failures. */
     [[nodiscard]] int failures() const noexcept { return session_->failures(); }
 

@@ -154,7 +154,7 @@ int RasterDescription::writeSection(const char* side_file) {
 }
 
 int RasterDescription::commitPair(quo::AtomicFile& raster, const char* side_file) {
-    quo::HeaderSession session{side_file};  // or the section would be saved by itself
+    quo::JoinedSession session{side_file};  // or the section would be saved by itself
     if (const int status = writeSection(side_file)) return status;
     quo::AtomicFile side{side_file};
     if (!side.good()) return QUO_NOT_OPENED;

@@ -23,10 +23,10 @@ using Job = std::function<int()>;
 using AddVerb = void(CLI::App& app, Job& job);
 AddVerb add_geolocate, add_orbit, add_time, add_tiepoints, add_info, add_validate, add_get, add_set, add_convert,
     add_quicklook, add_footprint, add_vrt, add_spectrum, add_resample, add_derive, add_fit, add_coregister,
-    add_config, add_debug_dump;
+    add_config, add_debug_dump, add_import;
 
 /** All of them, in the order in which the help lists them. */
-inline constexpr AddVerb* kVerbs[] = {add_geolocate, add_orbit,      add_time,     add_tiepoints, add_info,
+inline constexpr AddVerb* kVerbs[] = {add_import,     add_geolocate, add_orbit,      add_time,     add_tiepoints, add_info,
                                       add_validate,  add_get,        add_set,      add_convert,   add_quicklook,
                                       add_footprint, add_vrt,        add_spectrum, add_resample,  add_derive,
                                       add_fit,       add_coregister, add_config,   add_debug_dump};

@@ -1,0 +1,231 @@
+#include "quo_base/mission_import.h"
+
+#include <dlfcn.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <array>
+#include <bit>
+#include <cerrno>
+#include <filesystem>
+#include <limits>
+#include <memory>
+#include <new>
+#include <string>
+#include <vector>
+
+#include "diagnosticslib/call_frame.h"
+#include "missions/measurement.h"
+#include "missions/mission_xml.h"
+#include "missions/sentinel1.h"
+#include "quorelxmllib/header_session.h"
+#include "sarutillib/ground/bounded_text.h"
+
+namespace quo {
+namespace {
+
+constexpr const char* kSource = "mission_import";
+
+[[noreturn]] void refuse(int status, const std::string& line) { throw MissionRefusal{status, line}; }
+
+// --- The measurement --------------------------------------------------------------------------------------------
+
+/** The function of the module that holds libtiff; it stays loaded. */
+MeasurementEntry measurement_entry() {
+    Dl_info info{};
+    std::string folder;
+    if (dladdr(reinterpret_cast<const void*>(&quo_import_sentinel1), &info) && info.dli_fname)
+        folder = info.dli_fname;
+    folder.erase(folder.rfind('/') + 1);
+    for (const char* const place : {"quo_base/libquo_base_tiff.so", "libquo_base_tiff.so"}) {
+        void* const module = dlopen((folder + place).c_str(), RTLD_NOW | RTLD_LOCAL);
+        if (void* const entry = module ? dlsym(module, kMeasurementEntryName) : nullptr)
+            return reinterpret_cast<MeasurementEntry>(entry);
+    }
+    refuse(QUO_REFUSED, "libquo_base_tiff.so, which reads measurements, is not beside the library in quo_base/");
+}
+
+std::unique_ptr<Measurement> open_measurement(const std::string& file, const Sentinel1Product& product) {
+    char why[256] = "";
+    std::unique_ptr<Measurement> measurement{measurement_entry()(file.c_str(), why, sizeof why)};
+    errno = 0;
+    if (!measurement) refuse(QUO_REFUSED, file + ": " + why);
+    if (measurement->lines != product.lines || measurement->samples != product.samples)
+        refuse(QUO_REFUSED, file + ": has " + std::to_string(measurement->lines) + " lines of " +
+                                std::to_string(measurement->samples) + " samples, the annotation says " +
+                                std::to_string(product.lines) + " of " + std::to_string(product.samples));
+    if ((measurement->type != MeasuredType::kUnsignedShort) != product.is_complex)
+        refuse(QUO_REFUSED, file + ": its samples are not what the annotation says");
+    return measurement;
+}
+
+// --- The raster -------------------------------------------------------------------------------------------------
+
+/** What blocks of a measurement become in the raster: complex samples as they are, unsigned ones as 32-bit
+ * integers. */
+class BlockWriter {
+public:
+    BlockWriter(Measurement& measurement, BufferFile& raster) : measurement_{measurement}, raster_{raster} {
+        const std::size_t samples =
+            static_cast<std::size_t>(measurement.block_lines) * static_cast<std::size_t>(measurement.samples);
+        constexpr std::size_t kMost = std::size_t{1} << 30;
+        if (samples > kMost) refuse(QUO_REFUSED, "the measurement's blocks are longer than is believed");
+        block_.resize(samples * bytes_of(measurement.type));
+        if (widens()) wide_.resize(samples);
+    }
+
+    /** False where the measurement is cut short. */
+    bool copy(std::int32_t block) {
+        if (!measurement_.read(block, block_.data())) return false;
+        const std::int64_t first = std::int64_t{block} * measurement_.block_lines;
+        const auto lines =
+            static_cast<std::size_t>(std::min<std::int64_t>(measurement_.block_lines, measurement_.lines - first));
+        const std::size_t samples = lines * static_cast<std::size_t>(measurement_.samples);
+        if (!widens()) {
+            write(block_.data(), samples * bytes_of(measurement_.type));
+            return true;
+        }
+        const auto* const narrow = reinterpret_cast<const std::uint16_t*>(block_.data());
+        std::copy_n(narrow, samples, wide_.begin());
+        write(reinterpret_cast<const char*>(wide_.data()), samples * sizeof wide_[0]);
+        return true;
+    }
+
+private:
+    [[nodiscard]] bool widens() const { return measurement_.type == MeasuredType::kUnsignedShort; }
+    void write(const char* bytes, std::size_t count) {
+        constexpr std::size_t kPiece = 1 << 24;  // the raster counts bytes in an int
+        for (std::size_t done = 0; done < count; done += kPiece)
+            raster_.write(bytes + done, static_cast<int>(std::min(kPiece, count - done)));
+    }
+
+    Measurement& measurement_;
+    BufferFile& raster_;
+    std::vector<char> block_;
+    std::vector<std::int32_t> wide_;
+};
+
+int cell_type(MeasuredType type) {
+    switch (type) {
+        case MeasuredType::kShortComplex:
+            return SHORT_COMPLEX;
+        case MeasuredType::kFloatComplex:
+            return FLOAT_COMPLEX;
+        case MeasuredType::kUnsignedShort:
+            return INT32;
+    }
+    return CELL_NOT_SET;
+}
+
+void describe_raster(const Measurement& measurement, const char* name, BufferFile& raster) {
+    raster.setFilename(name);
+    raster.setLines(measurement.lines);
+    raster.setSamples(measurement.samples);
+    raster.setType(cell_type(measurement.type));
+}
+
+void copy_samples(const quo_import_request& request, Measurement& measurement, BufferFile& raster) {
+    if (const int status = raster.create()) refuse(status, std::string{request.raster} + ": cannot be made");
+    BlockWriter writer{measurement, raster};
+    for (std::int32_t block = 0; std::int64_t{block} * measurement.block_lines < measurement.lines; ++block) {
+        const std::int64_t line = std::int64_t{block} * measurement.block_lines;
+        if (request.progress && request.progress(request.context, line, measurement.lines) != 0)
+            refuse(QUO_REFUSED, std::string{request.raster} + ": the import was ended");
+        if (!writer.copy(block))
+            refuse(QUO_READ_FAILED, "the measurement is cut short or damaged at line " + std::to_string(line));
+        if (const int status = raster.status())
+            refuse(status, std::string{request.raster} + ": cannot be written");
+    }
+    if (request.progress) (void)request.progress(request.context, measurement.lines, measurement.lines);
+}
+
+/** A link takes the raster's name in one step. */
+void link_samples(const std::string& measurement, const std::string& raster) {
+    namespace fs = std::filesystem;
+    std::error_code error;
+    const fs::path target = fs::absolute(measurement, error);
+    const std::string beside = raster + ".link." + std::to_string(getpid());
+    fs::create_symlink(target, beside, error);
+    if (!error) fs::rename(beside, raster, error);
+    errno = 0;
+    if (!error) return;
+    std::error_code ignored;
+    fs::remove(beside, ignored);
+    refuse(QUO_WRITE_FAILED, raster + ": cannot be made a link: " + error.message());
+}
+
+// --- The header -------------------------------------------------------------------------------------------------
+
+/** Lets documents keep all digits of what is written while it lives. */
+void write_header(Sentinel1Product& product, const BufferFile& raster, const std::string& header) {
+    product.header.bufferFile.clone(&raster);
+    product.header.GSenable(gsBufferFile);
+    for (int i = 0; i < GeneralSAR::kObjects; ++i) {
+        const auto object = static_cast<GSObject>(i);
+        product.header.GSget(object)->setExactNumbers(true);
+    }
+    product.grid.setExactNumbers(true);
+    if (product.grid.writehdr(header.c_str()) != QUO_OK || product.header.GSwrite(header.c_str()) != QUO_OK)
+        refuse(QUO_WRITE_FAILED, header + ": cannot be written");
+}
+
+void import_product(const quo_import_request& request, quo_import_result& result) {
+    const auto given = [](const char* text) { return std::string{text ? text : ""}; };
+    const std::string raster_name = request.raster, header = raster_name + ".hdr";
+    const Sentinel1Files files =
+        find_sentinel1_files(request.source, given(request.swath), given(request.polarization));
+    const auto product = std::make_unique<Sentinel1Product>();
+    describe_sentinel1(files, given(request.orbit_file), *product);
+    const auto measurement = open_measurement(files.measurement, *product);
+
+    BufferFile& raster = product->header.bufferFile;
+    describe_raster(*measurement, request.raster, raster);
+    HeaderSession session{header.c_str()};
+    if (request.link != 0) {
+        if (measurement->plain_from < 0 || measurement->plain_from > std::numeric_limits<std::int32_t>::max() ||
+            measurement->type == MeasuredType::kUnsignedShort)
+            refuse(QUO_REFUSED, files.measurement +
+                                    ": its samples cannot be used where they are; import without a "
+                                    "link");
+        raster.HeaderOffset = measurement->plain_from;
+        raster.ByteOrder = measurement->big_endian ? 1 : 0;
+        write_header(*product, raster, header);
+        link_samples(files.measurement, raster_name);
+        if (const int status = session.commit()) refuse(status, header + ": cannot be written");
+    } else {
+        BufferFile copy;
+        copy.clone(&raster);
+        copy_samples(request, *measurement, copy);
+        write_header(*product, copy, header);
+        if (const int status = copy.commit()) refuse(status, raster_name + ": cannot be written");
+    }
+    result.lines = product->lines;
+    result.samples = product->samples;
+    result.linked = request.link != 0 ? 1 : 0;
+    result.ties = product->ties;
+}
+
+}  // namespace
+}  // namespace quo
+
+int quo_import_sentinel1(const quo_import_request* request, quo_import_result* result) noexcept {
+    quo::CallFrame frame{"quo_import_sentinel1", quo::kSource};
+    if (!request || !result || quo::text_or_empty(request->source).empty() ||
+        quo::text_or_empty(request->raster).empty())
+        return frame.fail(QUO_REFUSED, "The product or the raster has no name");
+    *result = {};
+    const auto fail = [&](int status, const char* line) {
+        quo::copy_bounded(result->message, line);
+        return frame.fail(status, line);
+    };
+    try {
+        quo::import_product(*request, *result);
+        return frame.success();
+    } catch (const quo::MissionRefusal& refusal) {
+        return fail(refusal.status(), refusal.what());
+    } catch (const std::bad_alloc&) {
+        return fail(QUO_NO_MEMORY, "Memory allocation failure");
+    } catch (const std::exception& other) {  // std::filesystem, of a name that it cannot take
+        return fail(QUO_REFUSED, other.what());
+    }
+}

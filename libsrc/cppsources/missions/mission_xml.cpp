@@ -1,0 +1,175 @@
+#include "missions/mission_xml.h"
+
+#include <libxml/parser.h>
+#include <libxml/tree.h>
+
+#include <cerrno>
+#include <charconv>
+#include <chrono>
+#include <cmath>
+#include <limits>
+
+#include "quo_base/api.h"
+#include "sarutillib/ground/file_io.h"
+#include "sarutillib/ground/number_text.h"
+
+namespace quo {
+namespace {
+
+/** A text that belongs to libxml2. */
+std::string taken(xmlChar* text) {
+    if (!text) return {};
+    const std::string copy{trimmed(reinterpret_cast<const char*>(text))};
+    xmlFree(text);
+    return copy;
+}
+
+_xmlNode* child(_xmlNode* node, std::string_view name) {
+    for (_xmlNode* at = node->children; at; at = at->next)
+        if (at->type == XML_ELEMENT_NODE && name == reinterpret_cast<const char*>(at->name)) return at;
+    return nullptr;
+}
+
+_xmlNode* node_at(_xmlNode* node, std::string_view path) {
+    while (node && !path.empty()) {
+        const auto slash = std::min(path.find('/'), path.size());
+        node = child(node, path.substr(0, slash));
+        path.remove_prefix(std::min(slash + 1, path.size()));
+    }
+    return node;
+}
+
+std::optional<double> number_of(std::string_view text) {
+    if (text.starts_with('+')) text.remove_prefix(1);
+    double value = 0.0;
+    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
+    if (error != std::errc{} || end != text.data() + text.size() || !std::isfinite(value)) return std::nullopt;
+    return value;
+}
+
+/** So many digits at the front of a text, which are taken from it, and a character behind them. */
+std::optional<int> digits(std::string_view& text, std::size_t count, char behind) {
+    int value = 0;
+    if (text.size() < count) return std::nullopt;
+    const auto [end, error] = std::from_chars(text.data(), text.data() + count, value);
+    if (error != std::errc{} || end != text.data() + count || text[0] == '-') return std::nullopt;
+    text.remove_prefix(count);
+    if (behind == '\0') return value;
+    if (!text.starts_with(behind)) return std::nullopt;
+    text.remove_prefix(1);
+    return value;
+}
+
+}  // namespace
+
+std::optional<SplitTime> split_time(std::string_view text) {
+    if (text.starts_with("UTC=")) text.remove_prefix(4);
+    if (text.ends_with('Z')) text.remove_suffix(1);
+    const auto year = digits(text, 4, '-'), month = digits(text, 2, '-'), day = digits(text, 2, 'T');
+    const auto hour = digits(text, 2, ':'), minute = digits(text, 2, ':'), second = digits(text, 2, '\0');
+    if (!year || !month || !day || !hour || !minute || !second) return std::nullopt;
+    namespace chrono = std::chrono;
+    const chrono::year_month_day date{chrono::year{*year}, chrono::month{static_cast<unsigned>(*month)},
+                                      chrono::day{static_cast<unsigned>(*day)}};
+    if (!date.ok() || *hour > 23 || *minute > 59 || *second > 60) return std::nullopt;
+    const double fraction = text.empty() ? 0.0 : number_of("0" + std::string{text}).value_or(-1.0);
+    if (!(fraction >= 0.0 && fraction < 1.0) || (!text.empty() && text[0] != '.')) return std::nullopt;
+    constexpr chrono::sys_days k1985{chrono::year{1985} / 1 / 1};
+    const auto days = (chrono::sys_days{date} - k1985).count();
+    return SplitTime{86400.0 * static_cast<double>(days) + 3600.0 * *hour + 60.0 * *minute + *second, fraction};
+}
+
+MissionXml::MissionXml(const std::string& file) : name_{file}, document_{nullptr} {
+    errno = 0;
+    const auto bytes = file_length(file.c_str());
+    if (!bytes) throw MissionRefusal{QUO_NOT_OPENED, file + ": cannot be opened"};
+    if (*bytes > kMostBytes) throw MissionRefusal{QUO_REFUSED, file + ": is too long for a product's description"};
+    xmlDoc* const document = xmlReadFile(file.c_str(), nullptr,
+                                         XML_PARSE_NONET | XML_PARSE_NOBLANKS | XML_PARSE_COMPACT |
+                                             XML_PARSE_NOERROR | XML_PARSE_NOWARNING | XML_PARSE_NOCDATA);
+    errno = 0;
+    document_ = document;
+    if (!document || !xmlDocGetRootElement(document) || document->intSubset) {
+        xmlFreeDoc(document);
+        throw MissionRefusal{QUO_REFUSED, file + ": is no XML file that can be read"};
+    }
+}
+
+MissionXml::~MissionXml() { xmlFreeDoc(static_cast<xmlDoc*>(document_)); }
+
+MissionXml::Element MissionXml::root() const {
+    return {xmlDocGetRootElement(static_cast<xmlDoc*>(document_)), this};
+}
+
+std::optional<MissionXml::Element> MissionXml::Element::find(std::string_view path) const {
+    _xmlNode* const node = node_at(node_, path);
+    return node ? std::optional{Element{node, file_}} : std::nullopt;
+}
+
+std::vector<MissionXml::Element> MissionXml::Element::list(std::string_view path, std::string_view name) const {
+    std::vector<Element> elements;
+    const _xmlNode* const above = node_at(node_, path);
+    for (_xmlNode* at = above ? above->children : nullptr; at; at = at->next)
+        if (at->type == XML_ELEMENT_NODE && name == reinterpret_cast<const char*>(at->name))
+            elements.emplace_back(at, file_);
+    return elements;
+}
+
+std::string MissionXml::Element::text() const { return taken(xmlNodeGetContent(node_)); }
+std::string MissionXml::Element::attribute(const char* name) const {
+    return taken(xmlGetProp(node_, reinterpret_cast<const xmlChar*>(name)));
+}
+
+void MissionXml::Element::refuse(const std::string& why) const {
+    throw MissionRefusal{QUO_REFUSED,
+                         file_->name() + ": line " + std::to_string(xmlGetLineNo(node_)) + ": " + why};
+}
+
+MissionXml::Element MissionXml::Element::at(std::string_view path) const {
+    if (const auto element = find(path)) return *element;
+    refuse("no element " + std::string{path} + " in " + reinterpret_cast<const char*>(node_->name));
+}
+
+std::string MissionXml::Element::text(std::string_view path) const { return at(path).text(); }
+
+double MissionXml::Element::number(std::string_view path) const {
+    const Element element = at(path);
+    const std::string text = element.text();
+    if (const auto value = number_of(text)) return *value;
+    element.refuse(std::string{path} + " is \"" + text + "\", not a number");
+}
+
+std::int32_t MissionXml::Element::integer(std::string_view path) const {
+    const double value = number(path);
+    if (value != std::floor(value) || std::abs(value) > std::numeric_limits<std::int32_t>::max())
+        at(path).refuse(std::string{path} + " is no whole number");
+    return static_cast<std::int32_t>(value);
+}
+
+SplitTime MissionXml::Element::time(std::string_view path) const {
+    const Element element = at(path);
+    const std::string text = element.text();
+    if (const auto time = split_time(text)) return *time;
+    element.refuse(std::string{path} + " is \"" + text + "\", not a time");
+}
+
+std::vector<double> MissionXml::Element::numbers(std::string_view path) const {
+    const Element element = at(path);
+    const std::string text = element.text();
+    std::vector<double> values;
+    for (std::string_view rest = trimmed(text); !rest.empty(); rest = trimmed(rest)) {
+        const auto end = std::min(rest.find_first_of(" \t\r\n"), rest.size());
+        const auto value = number_of(rest.substr(0, end));
+        if (!value) element.refuse(std::string{path} + " holds what is not a number");
+        values.push_back(*value);
+        rest.remove_prefix(end);
+    }
+    return values;
+}
+
+bool MissionXml::Element::truth(std::string_view path) const {
+    const auto element = find(path);
+    return element && element->text() == "true";
+}
+
+}  // namespace quo

@@ -1,0 +1,91 @@
+#include <algorithm>
+#include <filesystem>
+#include <string>
+#include <system_error>
+#include <vector>
+
+#include "missions/sentinel1.h"
+
+namespace quo {
+namespace {
+
+namespace fs = std::filesystem;
+
+std::string lower(std::string text) {
+    for (char& c : text)
+        if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
+    return text;
+}
+
+/** The parts of an annotation's name: s1a-iw1-slc-vv-... */
+std::vector<std::string> parts_of(const fs::path& annotation) {
+    std::vector<std::string> parts{""};
+    for (const char c : annotation.stem().string()) {
+        if (c == '-')
+            parts.emplace_back();
+        else
+            parts.back() += c;
+    }
+    return parts;
+}
+
+bool is_annotation(const fs::path& file) {
+    const auto parts = parts_of(file);
+    return file.extension() == ".xml" && parts.size() > 4 && parts[0].starts_with("s1");
+}
+
+std::vector<fs::path> annotations_in(const fs::path& folder) {
+    std::vector<fs::path> found;
+    std::error_code error;
+    for (fs::directory_iterator at{folder, error}, end; !error && at != end; at.increment(error))
+        if (is_annotation(at->path())) found.push_back(at->path());
+    std::ranges::sort(found);
+    return found;
+}
+
+fs::path choose(const std::vector<fs::path>& all, const std::string& source, const std::string& swath,
+                const std::string& polarization) {
+    std::vector<fs::path> fitting;
+    std::string offered;
+    for (const fs::path& file : all) {
+        const auto parts = parts_of(file);
+        offered += (offered.empty() ? "" : ", ") + parts[1] + " " + parts[3];
+        if ((swath.empty() || parts[1] == lower(swath)) &&
+            (polarization.empty() || parts[3] == lower(polarization)))
+            fitting.push_back(file);
+    }
+    if (all.empty()) throw MissionRefusal{QUO_REFUSED, source + ": holds no annotation of Sentinel-1"};
+    if (fitting.empty())
+        throw MissionRefusal{QUO_REFUSED, source + ": no such swath and polarization; there are " + offered};
+    if (fitting.size() > 1)
+        throw MissionRefusal{QUO_REFUSED, source + ": choose a swath and a polarization of " + offered};
+    return fitting.front();
+}
+
+}  // namespace
+
+Sentinel1Files find_sentinel1_files(const std::string& source, const std::string& swath,
+                                    const std::string& polarization) {
+    std::error_code error;
+    fs::path path{source};
+    if (!fs::exists(path, error)) throw MissionRefusal{QUO_NOT_OPENED, source + ": cannot be opened"};
+    if (path.filename() == "manifest.safe") path = path.parent_path().empty() ? fs::path{"."} : path.parent_path();
+    const fs::path annotation = fs::is_directory(path, error)
+                                    ? choose(annotations_in(path / "annotation"), source, swath, polarization)
+                                    : choose({path}, source, swath, polarization);
+    const fs::path product = annotation.parent_path() / "..";
+    Sentinel1Files files{annotation.string(), "", ""};
+    for (const char* const ending : {".tiff", ".tif"}) {
+        const fs::path measurement = product / "measurement" / (annotation.stem().string() + ending);
+        if (files.measurement.empty() && fs::exists(measurement, error))
+            files.measurement = measurement.lexically_normal().string();
+    }
+    if (files.measurement.empty())
+        throw MissionRefusal{QUO_NOT_OPENED, files.annotation + ": its measurement ../measurement/" +
+                                                 annotation.stem().string() + ".tiff is missing"};
+    const fs::path manifest = product / "manifest.safe";
+    if (fs::exists(manifest, error)) files.manifest = manifest.lexically_normal().string();
+    return files;
+}
+
+}  // namespace quo

@@ -1,0 +1,89 @@
+#include <cstdio>
+#include <memory>
+#include <optional>
+
+#include "apart.h"
+#include "commands.h"
+#include "interrupt.h"
+#include "progress.h"
+#include "quo_base/mission_import.h"
+
+namespace tool {
+namespace {
+
+struct ImportOptions {
+    std::string source, raster, swath, polarization, orbit;
+    bool link = false, waitbar = false;
+};
+
+/** Told of the lines that are taken over; an exception does not go through the library. */
+struct Watch {
+    explicit Watch(bool waitbar) : progress{waitbar ? "Importing" : nullptr} {}
+
+    static int step(void* self, std::int64_t done, std::int64_t all) {
+        auto& watch = *static_cast<Watch*>(self);
+        watch.progress.show(done, all, done);
+        try {
+            throw_if_interrupted();
+        } catch (const Interrupted& signal) {
+            watch.interrupted = signal;
+            return 1;
+        }
+        return 0;
+    }
+
+    Progress progress;
+    std::optional<Interrupted> interrupted;
+};
+
+void show(const ImportOptions& options, const quo_import_result& result) {
+    std::printf("%s: %d lines of %d samples%s\n", options.raster.c_str(), result.lines, result.samples,
+                result.linked != 0 ? ", linked" : "");
+    const quo_tie_points& ties = result.ties;
+    if (ties.count > 0)
+        std::printf(
+            "%d tie points: lines rms %.5f max %.5f, samples rms %.5f max %.5f, ground rms %.4f m max %.4f m\n",
+            ties.count, ties.rms_line, ties.most_line, ties.rms_sample, ties.most_sample, ties.rms_ground_m,
+            ties.most_ground_m);
+}
+
+int import_product(const ImportOptions& options) {
+    require_apart({options.source, options.orbit}, raster_files(options.raster));
+    note_interrupts();
+    quo_import_request request{};
+    request.source = options.source.c_str();
+    request.raster = options.raster.c_str();
+    request.swath = options.swath.c_str();
+    request.polarization = options.polarization.c_str();
+    request.orbit_file = options.orbit.c_str();
+    request.link = options.link ? 1 : 0;
+    quo_import_result result{};
+    {
+        Watch watch{options.waitbar};
+        request.progress = Watch::step;
+        request.context = &watch;
+        const int status = quo_import_sentinel1(&request, &result);
+        if (watch.interrupted) throw *watch.interrupted;
+        if (status != QUO_OK) throw Failure(result.message);
+    }
+    show(options, result);
+    return kFine;
+}
+
+}  // namespace
+
+void add_import(CLI::App& app, Job& job) {
+    const auto [command, options] =
+        add_verb(app, job, "import", "Takes over a Sentinel-1 product: SLC or GRD", import_product);
+    command->add_option("PRODUCT", options.source, "Folder *.SAFE, its manifest, or an annotation file")
+        ->required();
+    command->add_option("OUT", options.raster, "Raster to make, with a header OUT.hdr")->required();
+    command->add_option("--swath", options.swath, "Swath, such as IW1, where there are several");
+    command->add_option("--polarization", options.polarization,
+                        "Polarization, such as VV, where there are several");
+    command->add_option("--orbit", options.orbit, "Orbit file whose vectors take the place of the annotation's");
+    command->add_flag("--link", options.link, "Make OUT a link to the measurement, whose samples are not copied");
+    add_waitbar_option(*command, options.waitbar);
+}
+
+}  // namespace tool
