@@ -50,6 +50,8 @@ typedef struct quo_import_result {
  * the unsigned 16-bit samples of detected products become INT32. Raster and header appear together, or nothing
  * does; an older header of that name keeps the sections that the product has not.
  *
+ * An image of one swath gets its antenna pattern beside it, in a raster of the name and ".antenna".
+ *
  * @param[in]  request  what to do
  * @param[out] result   filled in any case
  * @return 0; 1 for a null, a product that is none of the mission's or lacks something, an orbit file that does not

@@ -7,6 +7,7 @@
 #include <array>
 #include <bit>
 #include <cerrno>
+#include <cstdlib>
 #include <filesystem>
 #include <limits>
 #include <memory>
@@ -30,19 +31,26 @@ constexpr const char* kSource = "mission_import";
 
 // --- The measurement --------------------------------------------------------------------------------------------
 
-/** The function of the module that holds libtiff; it stays loaded. */
+MeasurementEntry entry_of(const std::string& file) {
+    void* const module = dlopen(file.c_str(), RTLD_NOW | RTLD_LOCAL);  // stays loaded
+    return module ? reinterpret_cast<MeasurementEntry>(dlsym(module, kMeasurementEntryName)) : nullptr;
+}
+
+/** The function of the module that holds libtiff: the one that QUO_TIFF_MODULE names, else beside the library. */
 MeasurementEntry measurement_entry() {
+    // Secure: a program with raised rights does not load what its caller names.
+    if (const char* const named = secure_getenv("QUO_TIFF_MODULE"))
+        if (const MeasurementEntry entry = entry_of(named)) return entry;
     Dl_info info{};
     std::string folder;
     if (dladdr(reinterpret_cast<const void*>(&quo_import_sentinel1), &info) && info.dli_fname)
         folder = info.dli_fname;
     folder.erase(folder.rfind('/') + 1);
-    for (const char* const place : {"quo_base/libquo_base_tiff.so", "libquo_base_tiff.so"}) {
-        void* const module = dlopen((folder + place).c_str(), RTLD_NOW | RTLD_LOCAL);
-        if (void* const entry = module ? dlsym(module, kMeasurementEntryName) : nullptr)
-            return reinterpret_cast<MeasurementEntry>(entry);
-    }
-    refuse(QUO_REFUSED, "libquo_base_tiff.so, which reads measurements, is not beside the library in quo_base/");
+    for (const char* const place : {"quo_base/libquo_base_tiff.so", "libquo_base_tiff.so"})
+        if (const MeasurementEntry entry = entry_of(folder + place)) return entry;
+    refuse(QUO_REFUSED,
+           "libquo_base_tiff.so, which reads measurements, is neither beside the library in quo_base/ nor named "
+           "in QUO_TIFF_MODULE");
 }
 
 std::unique_ptr<Measurement> open_measurement(const std::string& file, const Sentinel1Product& product) {
@@ -156,18 +164,41 @@ void link_samples(const std::string& measurement, const std::string& raster) {
 
 // --- The header -------------------------------------------------------------------------------------------------
 
-/** Lets documents keep all digits of what is written while it lives. */
-void write_header(Sentinel1Product& product, const BufferFile& raster, const std::string& header) {
-    product.header.bufferFile.clone(&raster);
-    product.header.GSenable(gsBufferFile);
-    for (int i = 0; i < GeneralSAR::kObjects; ++i) {
-        const auto object = static_cast<GSObject>(i);
-        product.header.GSget(object)->setExactNumbers(true);
+/** The antenna pattern is a raster of its own, beside the product's: its header object takes the raster of its
+ * header for the pattern. Taken away again where what comes after it fails. */
+class PatternFiles {
+public:
+    explicit PatternFiles(std::string raster) : raster_{std::move(raster)} {}
+    ~PatternFiles() {
+        std::error_code ignored;
+        if (written_ && !kept_)
+            for (const char* const ending : {"", ".hdr"}) std::filesystem::remove(raster_ + ending, ignored);
     }
-    product.grid.setExactNumbers(true);
-    if (product.grid.writehdr(header.c_str()) != QUO_OK || product.header.GSwrite(header.c_str()) != QUO_OK)
-        refuse(QUO_WRITE_FAILED, header + ": cannot be written");
-}
+    PatternFiles(PatternFiles&&) = delete;
+
+    void write(AntennaPattern_Obj& pattern) {
+        if (pattern.PatternSamples == 0) return;
+        const std::string header = raster_ + ".hdr";
+        HeaderSession session{header.c_str()};
+        BufferFile raster{raster_.c_str()};
+        raster.setLines(1);
+        raster.setSamples(pattern.PatternSamples);
+        raster.setType(FLOAT32);
+        int status = raster.create();
+        if (status == QUO_OK) {
+            raster.writebuffer(pattern.Pattern.data(), 0, 1, 0, 0);
+            status = pattern.writehdr(header.c_str());
+            if (const int committed = raster.commit(); status == QUO_OK) status = committed;
+        }
+        if (status != QUO_OK) refuse(status, raster_ + ": cannot be written");
+        written_ = true;
+    }
+    void keep() { kept_ = true; }
+
+private:
+    std::string raster_;
+    bool written_ = false, kept_ = false;
+};
 
 void import_product(const quo_import_request& request, quo_import_result& result) {
     const auto given = [](const char* text) { return std::string{text ? text : ""}; };
@@ -181,6 +212,12 @@ void import_product(const quo_import_request& request, quo_import_result& result
     BufferFile& raster = product->header.bufferFile;
     describe_raster(*measurement, request.raster, raster);
     HeaderSession session{header.c_str()};
+    PatternFiles pattern{raster_name + ".antenna"};
+    const auto describe = [&](const BufferFile& made) {
+        if (&made != &raster) raster.clone(&made);
+        product->header.GSenable(gsBufferFile);
+        write_mission_header(*product, header);
+    };
     if (request.link != 0) {
         if (measurement->plain_from < 0 || measurement->plain_from > std::numeric_limits<std::int32_t>::max() ||
             measurement->type == MeasuredType::kUnsignedShort)
@@ -189,16 +226,19 @@ void import_product(const quo_import_request& request, quo_import_result& result
                                     "link");
         raster.HeaderOffset = measurement->plain_from;
         raster.ByteOrder = measurement->big_endian ? 1 : 0;
-        write_header(*product, raster, header);
+        describe(raster);
+        pattern.write(product->header.antennaPattern);
         link_samples(files.measurement, raster_name);
         if (const int status = session.commit()) refuse(status, header + ": cannot be written");
     } else {
         BufferFile copy;
         copy.clone(&raster);
         copy_samples(request, *measurement, copy);
-        write_header(*product, copy, header);
+        describe(copy);
+        pattern.write(product->header.antennaPattern);
         if (const int status = copy.commit()) refuse(status, raster_name + ": cannot be written");
     }
+    pattern.keep();
     result.lines = product->lines;
     result.samples = product->samples;
     result.linked = request.link != 0 ? 1 : 0;

@@ -64,7 +64,7 @@ std::vector<MissionVector> read_orbit_file(const std::string& file, const std::s
     const MissionXml xml{file};
     const auto root = xml.root();
     const std::string mission = root.text("Earth_Explorer_Header/Fixed_Header/Mission");
-    if ("S" + mission.substr(std::min(mission.size(), mission.find('-') + 1)) != satellite)
+    if (!mission.ends_with(satellite.substr(1)))
         throw MissionRefusal{QUO_REFUSED,
                              file + ": is an orbit of " + mission + ", the product is of " + satellite};
     if (root.text("Earth_Explorer_Header/Variable_Header/Ref_Frame") != "EARTH_FIXED")

@@ -362,6 +362,36 @@ void set_attitude(const Annotation& a, const ImageGrid_Obj& grid, GeneralSAR& pr
     product.GSenable(gsSensorAttitude);
 }
 
+/** The elevation pattern of the image's middle, of an image of one swath: amplitudes at equal steps of the angle.
+ */
+void set_pattern(const Annotation& a, const ImageGrid_Obj& grid, AntennaPattern_Obj& pattern) {
+    const auto all = a.root.list("antennaPattern/antennaPatternList", "antennaPattern");
+    if (a.detected || all.empty()) return;
+    const double middle_s = grid.FirstLine_s + 0.5 * (a.last_line.after(grid.Epoch_s) - grid.FirstLine_s);
+    const auto off_middle = [&](const Element& e) {
+        return std::abs(e.time("azimuthTime").after(grid.Epoch_s) - middle_s);
+    };
+    const Element nearest = *std::ranges::min_element(all, {}, off_middle);
+    const auto angles = nearest.numbers("elevationAngle"), parts = nearest.numbers("elevationPattern");
+    if (angles.size() < 2 || parts.size() != 2 * angles.size() || !std::ranges::is_sorted(angles) ||
+        angles.size() > static_cast<std::size_t>(AntennaPattern_Obj::kMaxPatternSamples))
+        nearest.refuse("the antenna pattern has no real and imaginary part for every angle, or too many");
+    pattern.PatternSamples = static_cast<std::int32_t>(angles.size());
+    pattern.StartAngle = angles.front();
+    pattern.DeltaAngle = (angles.back() - angles.front()) / static_cast<double>(angles.size() - 1);
+    if (const int status = pattern.createBuffers())
+        throw MissionRefusal{status, "no memory for the antenna pattern"};
+    for (std::size_t i = 0; i < angles.size(); ++i) {
+        const double angle = pattern.StartAngle + static_cast<double>(i) * pattern.DeltaAngle;
+        const auto above = std::clamp<std::ptrdiff_t>(std::ranges::upper_bound(angles, angle) - angles.begin(), 1,
+                                                      std::ssize(angles) - 1);
+        const auto k = static_cast<std::size_t>(above);
+        const double share = (angle - angles[k - 1]) / (angles[k] - angles[k - 1]);
+        const auto amplitude = [&](std::size_t j) { return std::hypot(parts[2 * j], parts[2 * j + 1]); };
+        pattern.Pattern[i] = static_cast<float>(std::lerp(amplitude(k - 1), amplitude(k), share));
+    }
+}
+
 // --- Tie points -------------------------------------------------------------------------------------------------
 
 /** Arrays of what the annotation states of its tie points, and of what is found instead. */
@@ -489,6 +519,15 @@ void describe_sentinel1(const Sentinel1Files& files, const std::string& orbit_fi
     set_region(a, product.grid, header);
     set_polynomials(a, product.grid, header);
     set_attitude(a, product.grid, header);
+    set_pattern(a, product.grid, header.antennaPattern);
+}
+
+void write_mission_header(Sentinel1Product& product, const std::string& header) {
+    for (int i = 0; i < GeneralSAR::kObjects; ++i)
+        product.header.GSget(static_cast<GSObject>(i))->setExactNumbers(true);
+    product.grid.setExactNumbers(true);
+    if (product.grid.writehdr(header.c_str()) != QUO_OK || product.header.GSwrite(header.c_str()) != QUO_OK)
+        throw MissionRefusal{QUO_WRITE_FAILED, header + ": cannot be written"};
 }
 
 }  // namespace quo

@@ -35,6 +35,9 @@ struct Sentinel1Product {
  * annotation's state vectors; empty: none. */
 void describe_sentinel1(const Sentinel1Files& files, const std::string& orbit_file, Sentinel1Product& product);
 
+/** Writes the header with all digits of its numbers: the times of lines need more than a header's 15. */
+void write_mission_header(Sentinel1Product& product, const std::string& header);
+
 }  // namespace quo
 
 #endif

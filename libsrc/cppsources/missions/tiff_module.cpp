@@ -78,10 +78,7 @@ public:
     }
 
     bool read(std::int32_t block, void* to) noexcept override {
-        if (!(tiled_ ? read_tiles(block, static_cast<char*>(to)) : read_strip(block, to))) return false;
-        if (big_endian)
-            mend_parts(to, static_cast<std::size_t>(lines_in(block)) * static_cast<std::size_t>(samples));
-        return true;
+        return tiled_ ? read_tiles(block, static_cast<char*>(to)) : read_strip(block, to);
     }
 
 private:
@@ -89,14 +86,6 @@ private:
     [[nodiscard]] std::int32_t lines_in(std::int32_t block) const {
         return static_cast<std::int32_t>(
             std::min(std::int64_t{block_lines}, std::int64_t{lines} - std::int64_t{block} * block_lines));
-    }
-
-    /** libtiff turns a complex sample of a big-endian file as if it were one number, which exchanges its parts. */
-    void mend_parts(void* values, std::size_t count) const {
-        if (type == MeasuredType::kUnsignedShort) return;
-        const std::size_t part = bytes_of(type) / 2;
-        for (char* at = static_cast<char*>(values); count > 0; --count, at += 2 * part)
-            std::swap_ranges(at, at + part, at + part);
     }
 
     const char* lay_out() {

@@ -1,0 +1,402 @@
+#include "missions/sentinel1.h"
+
+#include <gtest/gtest.h>
+#include <tiffio.h>
+
+#include <cmath>
+#include <cstdlib>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+#include "missions/mission_xml.h"
+#include "quo_base/generalSAR.h"
+#include "quo_base/image_grid.h"
+#include "quo_base/mission_import.h"
+#include "quo_base/product.h"
+#include "support/diagnostics.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr const char* kSlc = "S1A_IW_SLC__1SDV_20220104T170557_20220104T170624_041314_04E951_F1F1.SAFE";
+constexpr const char* kGrd = "S1B_IW_GRDH_1SDV_20211223T051122_20211223T051147_030148_039993_5371.SAFE";
+constexpr const char* kOrbit =
+    QUO_TEST_DATA "/sentinel1/S1A_OPER_AUX_RESORB_OPOD_20230823T174849_V20230823T141024_20230823T172754.EOF";
+
+/** How a made measurement stores its samples. */
+struct Layout {
+    const char* name;
+    std::uint16_t bits, format, compression;
+    bool tiled, big_endian;
+    std::uint32_t rows;  // of a strip
+};
+constexpr Layout kPlain{"Plain", 32, SAMPLEFORMAT_COMPLEXINT, COMPRESSION_NONE, false, false, 1};
+
+/** Part `part` of a made sample. */
+std::int16_t part_of(std::uint32_t line, std::uint32_t sample, std::uint32_t part) {
+    return static_cast<std::int16_t>(line * 1013 + sample * 37 + part * 5003);
+}
+
+void fill(const Layout& layout, std::uint32_t line, std::uint32_t sample, char* to) {
+    const std::int16_t parts[] = {part_of(line, sample, 0), part_of(line, sample, 1)};
+    const float floats[] = {parts[0] + 0.5F, parts[1] - 0.25F};
+    std::memcpy(to, layout.bits == 64 ? static_cast<const void*>(floats) : parts, layout.bits / 8);
+}
+
+void write_tiff(const std::string& file, const Layout& layout, std::uint32_t lines, std::uint32_t samples,
+                bool with_samples) {
+    TIFF* const tiff = TIFFOpen(file.c_str(), layout.big_endian ? "wb" : "wl");
+    ASSERT_NE(tiff, nullptr);
+    const std::size_t size = layout.bits / 8;
+    TIFFSetField(tiff, TIFFTAG_IMAGEWIDTH, samples);
+    TIFFSetField(tiff, TIFFTAG_IMAGELENGTH, lines);
+    TIFFSetField(tiff, TIFFTAG_BITSPERSAMPLE, layout.bits);
+    TIFFSetField(tiff, TIFFTAG_SAMPLEFORMAT, layout.format);
+    TIFFSetField(tiff, TIFFTAG_COMPRESSION, layout.compression);
+    TIFFSetField(tiff, TIFFTAG_PHOTOMETRIC, PHOTOMETRIC_MINISBLACK);
+    constexpr std::uint32_t kTile = 16;
+    if (layout.tiled) {
+        TIFFSetField(tiff, TIFFTAG_TILEWIDTH, kTile);
+        TIFFSetField(tiff, TIFFTAG_TILELENGTH, kTile);
+    } else {
+        TIFFSetField(tiff, TIFFTAG_ROWSPERSTRIP, layout.rows);
+    }
+    const std::uint32_t wide = layout.tiled ? kTile : samples, high = layout.tiled ? kTile : layout.rows;
+    for (std::uint32_t line = 0; line < (with_samples ? lines : 1); line += high)
+        for (std::uint32_t sample = 0; sample < (with_samples ? samples : 1); sample += wide) {
+            std::vector<char> block(std::size_t{wide} * high * size);
+            for (std::uint32_t i = 0; i < high && line + i < lines; ++i)
+                for (std::uint32_t j = 0; j < wide && sample + j < samples; ++j)
+                    fill(layout, line + i, sample + j, block.data() + (i * wide + j) * size);
+            const auto rows = layout.tiled ? high : std::min(high, lines - line);
+            const auto bytes = static_cast<tmsize_t>(std::size_t{wide} * rows * size);
+            if (layout.tiled)
+                TIFFWriteEncodedTile(tiff, TIFFComputeTile(tiff, sample, line, 0, 0), block.data(), bytes);
+            else
+                TIFFWriteEncodedStrip(tiff, line / high, block.data(), bytes);
+        }
+    TIFFClose(tiff);
+    errno = 0;
+}
+
+std::string replaced(std::string text, const std::string& from, const std::string& to) {
+    for (auto at = text.find(from); at != text.npos; at = text.find(from, at + to.size()))
+        text.replace(at, from.size(), to);
+    return text;
+}
+
+/** A copy of a product, to be changed, with a measurement. */
+class Safe {
+public:
+    Safe(const test::TemporaryFolder& folder, const char* name) : path_{folder.path() / name} {
+        fs::copy(fs::path{QUO_TEST_DATA "/sentinel1"} / name, path_, fs::copy_options::recursive);
+        fs::create_directory(path_ / "measurement");
+        for (const auto& file : fs::directory_iterator{path_ / "annotation"}) annotation_ = file.path();
+        setenv("QUO_TIFF_MODULE", QUO_TEST_TIFF_MODULE, 1);
+    }
+    [[nodiscard]] std::string path() const { return path_.string(); }
+    [[nodiscard]] fs::path annotation() const { return annotation_; }
+    [[nodiscard]] std::string measurement() const {
+        return (path_ / "measurement" / (annotation_.stem().string() + ".tiff")).string();
+    }
+    void change(const std::string& from, const std::string& to) {
+        const std::string text = test::read_text(annotation_), changed = replaced(text, from, to);
+        EXPECT_NE(text, changed) << from;
+        test::write_text(annotation_, changed);
+    }
+    void change_element(const std::string& name, const std::string& content) {
+        std::string text = test::read_text(annotation_);
+        const auto from = text.find("<" + name + ">") + name.size() + 2;
+        text.replace(from, text.find('<', from) - from, content);
+        test::write_text(annotation_, text);
+    }
+    /** An image of 40 lines of 30 samples, no bursts. */
+    void shrink(bool grd) {
+        change(grd ? "<numberOfLines>16705<" : "<numberOfLines>4503<", "<numberOfLines>40<");
+        change(grd ? "<numberOfSamples>26102<" : "<numberOfSamples>22694<", "<numberOfSamples>30<");
+        if (!grd) change("burst>", "past>");
+    }
+
+private:
+    fs::path path_, annotation_;
+};
+
+int import_safe(const std::string& source, const std::string& raster, quo_import_result& result,
+                const char* orbit = nullptr, bool link = false) {
+    quo_import_request request{};
+    request.source = source.c_str();
+    request.raster = raster.c_str();
+    request.orbit_file = orbit;
+    request.link = link ? 1 : 0;
+    return quo_import_sentinel1(&request, &result);
+}
+
+// --- Times and tie points ---------------------------------------------------------------------------------------
+
+TEST(Sentinel1, TakesTimesToTheMicrosecond) {
+    constexpr struct {
+        const char* text;
+        double whole_s, fraction_s;
+    } kTimes[] = {{"2022-01-04T17:05:58.268589", 1167930358.0, 0.268589},
+                  {"UTC=1985-01-01T00:00:00", 0.0, 0.0},
+                  {"2000-02-29T23:59:59.5Z", 478483199.0, 0.5}};
+    for (const auto& [text, whole_s, fraction_s] : kTimes) {
+        const auto time = quo::split_time(text);
+        ASSERT_TRUE(time) << text;
+        EXPECT_EQ(time->whole_s, whole_s);
+        EXPECT_EQ(time->fraction_s, fraction_s);
+    }
+    for (const char* text :
+         {"", "2022-02-29T00:00:00", "2022-01-04 17:05:58", "2022-01-04T24:00:00", "2022-01-04T17:05",
+          "2022-01-04T17:05:58.2x", "-022-01-04T17:05:58", "2022-01-04T17:05:58,5"})
+        EXPECT_FALSE(quo::split_time(text)) << text;
+}
+
+struct Truth {
+    const char* safe;
+    bool grd;
+    int ties;
+    double most_line, most_sample, most_ground_m;
+};
+class Sentinel1Products : public testing::TestWithParam<Truth> {};
+
+TEST_P(Sentinel1Products, AgreeWithTheirTiePointsBothWays) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    const Truth truth = GetParam();
+    const Safe safe{folder, truth.safe};
+    const std::string header = folder.file("scene.hdr");
+    {
+        // Without the measurement, whose zeros would fill gigabytes.
+        const auto made = std::make_unique<quo::Sentinel1Product>();
+        quo::describe_sentinel1({safe.annotation().string(), "", ""}, "", *made);
+        EXPECT_EQ(made->ties.count, truth.ties);
+        EXPECT_LT(made->ties.most_line, truth.most_line);
+        EXPECT_LT(made->ties.most_sample, truth.most_sample);
+        EXPECT_LT(made->ties.most_ground_m, truth.most_ground_m);
+        quo::write_mission_header(*made, header);
+    }
+
+    // Once more from the header alone, point by point.
+    GeneralSAR product;
+    ImageGrid_Obj grid;
+    ASSERT_EQ(product.GSread(header.c_str()), 0);
+    ASSERT_EQ(grid.readhdr(header.c_str()), 0);
+    const quo::MissionXml xml{safe.annotation().string()};
+    double line_off = 0.0, sample_off = 0.0, ground_off_m = 0.0;
+    for (const auto& tie : xml.root().list("geolocationGrid/geolocationGridPointList", "geolocationGridPoint")) {
+        double xyz[3], found[3], azimuth_s = 0.0, range_s = 0.0, line[2], sample = 0.0;
+        const double stated_line = tie.number("line"), stated_sample = tie.number("pixel");
+        quo::store(quo::from_geodetic({tie.number("latitude"), tie.number("longitude"), tie.number("height")}),
+                   xyz);
+        ASSERT_EQ(product.orbit.earth2sat(xyz, &azimuth_s, &range_s), 0);
+        ASSERT_EQ(grid.timePixels({1, &azimuth_s, &range_s}, {&line[0], &line[1], &sample}), 0);
+        line_off = std::max(line_off, std::fmin(std::abs(line[0] - stated_line), std::abs(line[1] - stated_line)));
+        sample_off = std::max(sample_off, std::abs(sample - stated_sample));
+        ASSERT_EQ(grid.pixelTimes({1, &stated_line, &stated_sample}, {&azimuth_s, &range_s}), 0);
+        GrPtGeometry at{};
+        ASSERT_EQ(product.orbit.SVGetGeometry(azimuth_s, range_s, 0.0, tie.number("height"), &at), 0);
+        for (int i = 0; i < 3; ++i) found[i] = at.point_m[i] - xyz[i];
+        ground_off_m = std::max(ground_off_m, std::hypot(found[0], found[1], found[2]));
+    }
+    EXPECT_LT(line_off, truth.most_line);
+    EXPECT_LT(sample_off, truth.most_sample);
+    EXPECT_LT(ground_off_m, truth.most_ground_m);
+}
+INSTANTIATE_TEST_SUITE_P(Real, Sentinel1Products,
+                         testing::Values(Truth{kSlc, false, 15, 0.001, 0.001, 0.05},
+                                         Truth{kGrd, true, 20, 0.001, 0.012, 0.15}),
+                         [](const auto& test) { return std::string{test.param.grd ? "Grd" : "Slc"}; });
+
+// --- Fields -----------------------------------------------------------------------------------------------------
+
+TEST(Sentinel1, FillsTheHeadersFields) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    Safe safe{folder, kSlc};
+    safe.shrink(false);
+    write_tiff(safe.measurement(), kPlain, 40, 30, true);
+    quo_import_result result{};
+    const std::string header = folder.file("scene") + ".hdr";
+    ASSERT_EQ(import_safe(safe.path() + "/manifest.safe", folder.file("scene"), result), 0) << result.message;
+    quo_product* product = nullptr;
+    ASSERT_EQ(quo_product_open(header.c_str(), nullptr, &product), 0);
+    constexpr struct {
+        const char* field;
+        double value;
+    } kNumbers[] = {
+        {"SamplingConstants/fc_hz", 5.405000454334350e9},
+        {"SamplingConstants/Baz_hz", 327.0},
+        {"SamplingConstants/pri_s", 5.823674372819869e-4},
+        {"Pulse/PulseLength", 5.240481033595628e-5},
+        {"Pulse/PulseKRate", 1.078230321255894e12},
+        {"SpectralWindows/RgMatchedFilterCoef", 0.75},
+        {"SwathInfo/Rank", 9.0},
+        {"SwathInfo/Swst_changes", 1.0},
+        {"DataSetInfo/SceneHeading", -13.67718277152630},
+        {"DataSetInfo/RO_REF", 8e5},
+        {"StateVectorData/t0SV_s", 1167930296.781409},
+        {"ROI/FastStartTime", 5.336535882737799e-3},
+        {"PolySAR/nfr", 4.0},
+        {"PolySAR/DopplerRate-0/trg0_s", 5.336535882737799e-3},
+        {"RasterInfo/CellType", SHORT_COMPLEX},
+    };
+    for (const auto& [field, value] : kNumbers) {
+        double number = 0.0;
+        EXPECT_EQ(quo_product_number(product, field, &number), 0) << field;
+        EXPECT_NEAR(number, value, 1e-15 * std::abs(value)) << field;
+    }
+    constexpr struct {
+        const char *field, *value;
+    } kTexts[] = {{"DataSetInfo/OrbitNumber", "41314"},
+                  {"DataSetInfo/Track", "117"},
+                  {"DataSetInfo/SenseDate", "04-JAN-2022 17:05:58.268589"},
+                  {"DataSetInfo/ProcessingSoftware", "Sentinel-1 IPF 003.40"},
+                  {"DataSetInfo/Polarization", "V/V"},
+                  {"DataSetInfo/Swath", "IW1"},
+                  {"DataSetInfo/SensorName", "SENTINEL-1A"},
+                  {"DataSetInfo/ImageType", "AZIMUTH FOCUSED"},
+                  {"DataSetInfo/OrbitConfiguration", "ASCENDING"},
+                  {"SpectralWindows/AzMatchedFilterType", "Hamming"}};
+    for (const auto& [field, value] : kTexts) {
+        char text[QUO_PRODUCT_TEXT_ROOM] = "";
+        EXPECT_EQ(quo_product_text(product, field, text, sizeof text), 0) << field;
+        EXPECT_STREQ(text, value) << field;
+    }
+    quo_product_close(product);
+
+    AntennaPattern_Obj pattern;
+    ASSERT_EQ(pattern.readhdr((folder.file("scene") + ".antenna.hdr").c_str()), 0);
+    std::vector<float> samples(static_cast<std::size_t>(pattern.PatternSamples));
+    ASSERT_EQ(pattern.getPatternArray(samples.data()), 0);
+    EXPECT_EQ(samples.size(), 45U);
+    EXPECT_NEAR(pattern.StartAngle, 27.16393, 1e-12);
+    EXPECT_NEAR(samples[0], std::hypot(1.244056e+14, -1.123778e+14), 2e7);
+}
+
+// --- Measurements -----------------------------------------------------------------------------------------------
+
+class Measurements : public testing::TestWithParam<Layout> {};
+
+TEST_P(Measurements, GiveTheirSamplesWhateverTheLayout) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    const Layout layout = GetParam();
+    const bool grd = layout.bits == 16;
+    Safe safe{folder, grd ? kGrd : kSlc};
+    safe.shrink(grd);
+    write_tiff(safe.measurement(), layout, 40, 30, true);
+    const bool plain = layout.compression == COMPRESSION_NONE && !layout.tiled;
+    for (const bool link : {false, true}) {
+        quo_import_result result{};
+        const std::string raster = folder.file(link ? "linked" : "copied");
+        ASSERT_EQ(import_safe(safe.annotation().string(), raster, result, nullptr, link),
+                  link && (!plain || grd) ? 1 : 0)
+            << result.message;
+        EXPECT_EQ(fs::is_symlink(raster), link && plain && !grd);
+        if (!fs::exists(raster)) {
+            EXPECT_FALSE(fs::exists(raster + ".hdr"));
+            EXPECT_FALSE(fs::exists(raster + ".antenna"));
+            continue;
+        }
+        DataFile file;
+        ASSERT_EQ(file.read_hdr(raster.c_str()), 0);
+        std::vector<dcomplex> complex(40 * 30);
+        std::vector<double> real(40 * 30);
+        BufferIO block{&file, 0, 30, 0, 40, grd ? FLOAT64 : DOUBLE_COMPLEX};
+        ASSERT_EQ(block.readbuffer(
+                      grd ? reinterpret_cast<char*>(real.data()) : reinterpret_cast<char*>(complex.data()), 30),
+                  0);
+        for (std::uint32_t i = 0; i < 40 * 30; ++i) {
+            const std::int16_t parts[] = {part_of(i / 30, i % 30, 0), part_of(i / 30, i % 30, 1)};
+            if (grd)
+                ASSERT_EQ(real[i], static_cast<std::uint16_t>(parts[0])) << i;
+            else if (layout.bits == 64)
+                ASSERT_EQ(complex[i], dcomplex(parts[0] + 0.5, parts[1] - 0.25)) << i;
+            else
+                ASSERT_EQ(complex[i], dcomplex(parts[0], parts[1])) << i;
+        }
+    }
+}
+INSTANTIATE_TEST_SUITE_P(
+    Tiff, Measurements,
+    testing::Values(kPlain, Layout{"Strips", 32, SAMPLEFORMAT_COMPLEXINT, COMPRESSION_NONE, false, false, 7},
+                    Layout{"BigEndian", 32, SAMPLEFORMAT_COMPLEXINT, COMPRESSION_NONE, false, true, 1},
+                    Layout{"Lzw", 32, SAMPLEFORMAT_COMPLEXINT, COMPRESSION_LZW, false, false, 16},
+                    Layout{"TiledFloats", 64, SAMPLEFORMAT_COMPLEXIEEEFP, COMPRESSION_ADOBE_DEFLATE, true, false,
+                           0},
+                    Layout{"TiledBigEndianFloats", 64, SAMPLEFORMAT_COMPLEXIEEEFP, COMPRESSION_LZW, true, true, 0},
+                    Layout{"DetectedStrips", 16, SAMPLEFORMAT_UINT, COMPRESSION_NONE, false, false, 1},
+                    Layout{"DetectedTiles", 16, SAMPLEFORMAT_UINT, COMPRESSION_LZW, true, true, 0}),
+    [](const auto& test) { return std::string{test.param.name}; });
+
+// --- What is refused --------------------------------------------------------------------------------------------
+
+TEST(Sentinel1, RefusesWhatDoesNotFitAndLeavesNothing) {
+    const test::Report report;
+    constexpr struct {
+        const char *from, *to, *message;
+    } kChanges[] = {
+        {"<productType>SLC<", "<productType>OCN<", "the product type OCN is neither SLC nor GRD"},
+        {"<missionId>S1A<", "<missionId>ASA<", "the mission ASA is not Sentinel-1"},
+        {"<rangeSamplingRate>", "<rangeSamplingTate>", "is no XML file that can be read"},
+        {"rangeSamplingRate>", "rangeSamplingTate>", "no element productInformation/rangeSamplingRate"},
+        {"<prf>", "<prf>", nullptr},
+        {"<azimuthTimeInterval>2.", "<azimuthTimeInterval>-2.", "line and sample times make no image"},
+        {"<numberOfLines>40<", "<numberOfLines>41<", "has 40 lines of 30 samples, the annotation says 41 of 30"},
+        {"<slantRangeTime>5.3", "<slantRangeTime>5.x", "not a number"},
+        {"<time>2022-01-04T17:04:56", "<time>2022-01-04T17:64:56", "not a time"},
+        {"<orbit>", "<!DOCTYPE x><orbit>", "is no XML file that can be read"},
+        {"<frame>Earth Fixed</frame>", "", nullptr},
+        {"orbit>", "arc>", "its state vectors make no orbit"},
+        {"azimuthFmRatePolynomial count=\"3\">", "azimuthFmRatePolynomial count=\"3\">1 2 3 ",
+         "a polynomial with more terms than are known"},
+    };
+    for (const auto& [from, to, message] : kChanges) {
+        const test::TemporaryFolder folder;
+        Safe safe{folder, kSlc};
+        safe.shrink(false);
+        write_tiff(safe.measurement(), kPlain, 40, 30, true);
+        if (std::string{from} != to) safe.change(from, to);
+        quo_import_result result{};
+        const int status = import_safe(safe.path(), folder.file("scene"), result);
+        EXPECT_EQ(status == 0, message == nullptr) << from << ": " << result.message;
+        if (message == nullptr) continue;
+        EXPECT_NE(std::string{result.message}.find(message), std::string::npos) << result.message;
+        EXPECT_EQ(std::string{result.message}.find('\n'), std::string::npos);
+        EXPECT_EQ(std::distance(fs::directory_iterator{folder.path()}, {}), 1) << from;
+    }
+}
+
+TEST(Sentinel1, TakesAnOrbitFileThatFits) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    Safe safe{folder, kSlc};
+    safe.shrink(false);
+    write_tiff(safe.measurement(), kPlain, 40, 30, true);
+    quo_import_result result{};
+    EXPECT_EQ(import_safe(safe.path(), folder.file("scene"), result, kOrbit), 1);
+    EXPECT_NE(std::string{result.message}.find("does not cover the product"), std::string::npos) << result.message;
+    // The day of the orbit file's vectors.
+    safe.change("2022-01-04T17:0", "2023-08-23T14:1");
+    for (const char* element : {"FirstLine", "LastLine"})
+        safe.change_element(std::string{"product"} + element + "UtcTime", "2023-08-23T14:12:00.268589");
+    ASSERT_EQ(import_safe(safe.path(), folder.file("scene"), result, kOrbit), 0) << result.message;
+    GeneralSAROrbit orbit;
+    ASSERT_EQ(orbit.readhdr((folder.file("scene") + ".hdr").c_str()), 0);
+    EXPECT_EQ(orbit.nSV_n, 8);  // from 40 s before the image to 40 s after it
+    EXPECT_EQ(orbit.t0SV_s, 1219414283.657814);
+    EXPECT_EQ(orbit.dtSV_s, 10.0);
+    const test::TemporaryFolder other;
+    const Safe grd{other, kGrd};
+    write_tiff(grd.measurement(), {"", 16, SAMPLEFORMAT_UINT, COMPRESSION_LZW, true, false, 0}, 16705, 26102,
+               false);
+    EXPECT_EQ(import_safe(grd.path(), folder.file("other"), result, kOrbit), 1);
+    EXPECT_NE(std::string{result.message}.find("is an orbit of Sentinel-1A, the product is of S1B"),
+              std::string::npos)
+        << result.message;
+}
+
+}  // namespace
