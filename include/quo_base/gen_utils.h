@@ -130,6 +130,24 @@ QUO_BASE_API void sec852mjd(double t, MjdRecord* record_out) QUO_NOEXCEPT;
  * and with "Date should be earlier than 1-JAN-10000\n" for one beyond four-digit years or not-a-number. */
 QUO_BASE_API int sec852myascii(double t, char* text_out) QUO_NOEXCEPT;
 
+/** Characters of an ISO text. */
+enum { ISO_TEXT_LENGTH = 26 };
+
+/** sec85 to ISO 8601 text, such as "2022-01-04T17:05:58.268589", rounded to microseconds.
+ *
+ * @param[in]  t         sec85, 0 or later and before the year 10000
+ * @param[out] text_out  room for ISO_TEXT_LENGTH + 1 characters; unchanged unless 0 is returned
+ * @return 0; 1 for a null pointer or another time */
+QUO_BASE_API int sec852iso(double t, char* text_out) QUO_NOEXCEPT;
+
+/** ISO 8601 text to sec85: date and time of day to any number of decimals, with or without "UTC=" before it and "Z"
+ * behind it. Of a time in this century the double keeps quarters of a microsecond.
+ *
+ * @param[in]  text   the text
+ * @param[out] t_out  sec85, negative before 1985; unchanged unless 0 is returned
+ * @return 0; 1 for a null pointer or another text */
+QUO_BASE_API int iso2sec85(const char* text, double* t_out) QUO_NOEXCEPT;
+
 /** sec85 or MJD record to the long date text, without the terminating zero: exactly 27 characters are written.
  * A time that sec852myascii refuses leaves its message there and 27 blanks here. */
 QUO_BASE_API void sec852ascii(double t, char* text_out) QUO_NOEXCEPT;

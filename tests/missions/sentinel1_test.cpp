@@ -238,7 +238,7 @@ TEST(Sentinel1, FillsTheHeadersFields) {
         {"DataSetInfo/SceneHeading", -13.67718277152630},
         {"DataSetInfo/RO_REF", 8e5},
         {"StateVectorData/t0SV_s", 1167930296.781409},
-        {"ROI/FastStartTime", 5.336535882737799e-3},
+        {"ROI/FastStartTime", 5.336535882737799e-3}, {"ROI/SlowStartTime", 1167930358.268589},
         {"PolySAR/nfr", 4.0},
         {"PolySAR/DopplerRate-0/trg0_s", 5.336535882737799e-3},
         {"RasterInfo/CellType", SHORT_COMPLEX},

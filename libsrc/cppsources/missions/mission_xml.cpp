@@ -5,7 +5,6 @@
 
 #include <cerrno>
 #include <charconv>
-#include <chrono>
 #include <cmath>
 #include <limits>
 
@@ -47,37 +46,7 @@ std::optional<double> number_of(std::string_view text) {
     return value;
 }
 
-/** So many digits at the front of a text, which are taken from it, and a character behind them. */
-std::optional<int> digits(std::string_view& text, std::size_t count, char behind) {
-    int value = 0;
-    if (text.size() < count) return std::nullopt;
-    const auto [end, error] = std::from_chars(text.data(), text.data() + count, value);
-    if (error != std::errc{} || end != text.data() + count || text[0] == '-') return std::nullopt;
-    text.remove_prefix(count);
-    if (behind == '\0') return value;
-    if (!text.starts_with(behind)) return std::nullopt;
-    text.remove_prefix(1);
-    return value;
-}
-
 }  // namespace
-
-std::optional<SplitTime> split_time(std::string_view text) {
-    if (text.starts_with("UTC=")) text.remove_prefix(4);
-    if (text.ends_with('Z')) text.remove_suffix(1);
-    const auto year = digits(text, 4, '-'), month = digits(text, 2, '-'), day = digits(text, 2, 'T');
-    const auto hour = digits(text, 2, ':'), minute = digits(text, 2, ':'), second = digits(text, 2, '\0');
-    if (!year || !month || !day || !hour || !minute || !second) return std::nullopt;
-    namespace chrono = std::chrono;
-    const chrono::year_month_day date{chrono::year{*year}, chrono::month{static_cast<unsigned>(*month)},
-                                      chrono::day{static_cast<unsigned>(*day)}};
-    if (!date.ok() || *hour > 23 || *minute > 59 || *second > 60) return std::nullopt;
-    const double fraction = text.empty() ? 0.0 : number_of("0" + std::string{text}).value_or(-1.0);
-    if (!(fraction >= 0.0 && fraction < 1.0) || (!text.empty() && text[0] != '.')) return std::nullopt;
-    constexpr chrono::sys_days k1985{chrono::year{1985} / 1 / 1};
-    const auto days = (chrono::sys_days{date} - k1985).count();
-    return SplitTime{86400.0 * static_cast<double>(days) + 3600.0 * *hour + 60.0 * *minute + *second, fraction};
-}
 
 MissionXml::MissionXml(const std::string& file) : name_{file}, document_{nullptr} {
     errno = 0;

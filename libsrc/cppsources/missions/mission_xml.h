@@ -9,6 +9,8 @@
 #include <string_view>
 #include <vector>
 
+#include "sarutillib/ground/iso_time.h"
+
 // NOLINTNEXTLINE(bugprone-reserved-identifier,readability-identifier-naming): libxml2's own name
 extern "C" struct _xmlNode;
 
@@ -23,18 +25,6 @@ public:
 private:
     int status_;
 };
-
-/** A moment to the microsecond: a double of seconds since 1985 alone would round it to a quarter of one. */
-struct SplitTime {
-    double whole_s = 0.0;     ///< whole seconds since 1985
-    double fraction_s = 0.0;  ///< the rest, from 0 to below 1
-
-    [[nodiscard]] double seconds() const { return whole_s + fraction_s; }
-    [[nodiscard]] double after(double epoch_s) const { return (whole_s - epoch_s) + fraction_s; }
-};
-
-/** Of "2022-01-04T17:05:58.268589", with or without "UTC=" before and "Z" behind it; nothing for other texts. */
-std::optional<SplitTime> split_time(std::string_view text);
 
 /** An XML file of a mission, in memory. */
 class MissionXml {

@@ -525,6 +525,7 @@ void describe_sentinel1(const Sentinel1Files& files, const std::string& orbit_fi
 void write_mission_header(Sentinel1Product& product, const std::string& header) {
     for (int i = 0; i < GeneralSAR::kObjects; ++i)
         product.header.GSget(static_cast<GSObject>(i))->setExactNumbers(true);
+    product.header.roi.Roi.setExactNumbers(true);
     product.grid.setExactNumbers(true);
     if (product.grid.writehdr(header.c_str()) != QUO_OK || product.header.GSwrite(header.c_str()) != QUO_OK)
         throw MissionRefusal{QUO_WRITE_FAILED, header + ": cannot be written"};

@@ -22,11 +22,20 @@ std::optional<std::string> date_text(double seconds) {
     return text;
 }
 
+std::string iso_text(double seconds) {
+    char text[ISO_TEXT_LENGTH + 1] = "";
+    return sec852iso(seconds, text) == 0 ? text : "";
+}
+
 double seconds_of(const std::string& text) {
     if (const auto number = finite_number(text)) return *number;
+    double seconds = 0.0;
+    if (iso2sec85(text.c_str(), &seconds) == 0) return seconds;
     DateFields fields;
     if (date2str(text.c_str(), &fields) != 0)
-        throw WrongUse("\"" + text + "\" is neither seconds nor a date such as \"04-JAN-2022 17:05:58.5\"");
+        throw WrongUse("\"" + text +
+                       "\" is neither seconds nor a date such as \"04-JAN-2022 17:05:58.5\" or "
+                       "\"2022-01-04T17:05:58.5\"");
     return ascii2sec85(text.c_str());
 }
 

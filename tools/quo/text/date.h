@@ -13,7 +13,10 @@ namespace tool {
  * ...16.781408. */
 std::optional<std::string> date_text(double seconds);
 
-/** Seconds since 1985 of a number or a date text. Throws WrongUse where the text is neither. */
+/** The ISO 8601 text of such a time, to the microsecond; empty where there is none. */
+std::string iso_text(double seconds);
+
+/** Seconds since 1985 of a number, a date text or an ISO 8601 text. Throws WrongUse where the text is neither. */
 double seconds_of(const std::string& text);
 
 }  // namespace tool

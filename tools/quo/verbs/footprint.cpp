@@ -3,6 +3,7 @@
 #include <nlohmann/json.hpp>
 
 #include "commands.h"
+#include "date.h"
 #include "product.h"
 #include "scene.h"
 
@@ -70,6 +71,26 @@ nlohmann::ordered_json geometry_of(Ring ring) {
     return {{"type", "MultiPolygon"}, {"coordinates", parts}};
 }
 
+/** What users search outlines by; of what the header does not tell nothing. */
+nlohmann::ordered_json properties_of(const std::string& header, const GeneralSAR& product) {
+    const DataSetInfo_Obj& info = product.dataSetInfo;
+    nlohmann::ordered_json properties{{"header", header}, {"scene", info.SceneID}};
+    const auto add = [&](const char* key, const std::string& text, std::string_view unknown) {
+        if (product.GSexists(gsDataSetInfo) && text != unknown && text != "NOT_AVAILABLE") properties[key] = text;
+    };
+    add("mission", info.SensorName, "SENSOR UNKNOWN");
+    add("mode", info.AcquisitionMode, "ACQUISITION MODE UNDEFINED");
+    add("polarization", info.Polarization, "");
+    add("orbit_number", info.OrbitNumber, "");
+    if (product.GSexists(gsRoi) && product.roi.Roi.isNULL() == 0) {
+        properties["start_time"] = iso_text(product.roi.Roi.SlowStartTime);
+        properties["stop_time"] = iso_text(last_line_time(product.roi.Roi));
+    }
+    if (product.GSexists(gsOrbit))
+        properties["orbit_direction"] = product.orbit.isAscending() ? "ascending" : "descending";
+    return properties;
+}
+
 int footprint(const std::string& header) {
     GeneralSAR product;
     read_product(header, product);
@@ -79,9 +100,7 @@ int footprint(const std::string& header) {
     if (ring.empty())
         throw Failure(header + ": neither a corner grid nor orbit, region and look side to find the corners from");
     const nlohmann::ordered_json feature{
-        {"type", "Feature"},
-        {"properties", {{"header", header}, {"scene", product.dataSetInfo.SceneID}}},
-        {"geometry", geometry_of(ring)}};
+        {"type", "Feature"}, {"properties", properties_of(header, product)}, {"geometry", geometry_of(ring)}};
     print_json(feature, -1);
     return kFine;
 }

@@ -1,6 +1,7 @@
 #include "commands.h"
 #include "date.h"
 #include "facts.h"
+#include "pixels.h"
 #include "product.h"
 #include "raster.h"
 
@@ -26,6 +27,7 @@ void add_data_set(Facts& facts, const DataSetInfo_Obj& info) {
     add_known(facts, "mode", "mode", info.AcquisitionMode, "ACQUISITION MODE UNDEFINED");
     add_known(facts, "polarization", "polarization", info.Polarization, "");
     add_known(facts, "swath", "swath", info.Swath, "");
+    add_known(facts, "orbit number", "orbit_number", info.OrbitNumber, "");
     add_known(facts, "scene", "scene", info.SceneID, "");
     add_known(facts, "description", "description", info.Description, "");
     add_known(facts, "image type", "image_type", info.ImageType, "NOT SET");
@@ -84,6 +86,33 @@ void add_corners(Facts& facts, GeneralSAR& product) {
     if (!text.empty()) facts.add("corners", "corners", text + "  (latitude longitude, degrees)", list);
 }
 
+/** What the pixels are on the ground, of a raster that the header places. */
+void add_geometry(Facts& facts, const std::string& header, GeneralSAR& product) {
+    if (!Pixels::known(header, product)) return;
+    const Pixels pixels{header, product};
+    const double middle = 0.5 * (pixels.lines() - 1);
+    constexpr struct {
+        const char *name, *key;
+        double share;
+    } kPlaces[] = {{"near range", "near", 0.0}, {"mid range", "mid", 0.5}, {"far range", "far", 1.0}};
+    for (const auto& [name, key, share] : kPlaces) {
+        const double sample = share * (pixels.samples() - 1);
+        const auto times = pixels.times(middle, sample);
+        const auto seen = pixels.geometry(middle, sample);
+        if (!times || !seen) continue;
+        const double slant_m = 0.5 * quo::kLightSpeed * times->range_s;
+        facts.add(name, key, fixed(slant_m, 1) + " m, incidence " + fixed(seen->incidence_deg, 3) + " degrees",
+                  {{"slant_range_m", slant_m},
+                   {"range_time_s", times->range_s},
+                   {"incidence_deg", seen->incidence_deg}});
+    }
+    if (const auto spacing = pixels.ground_spacing())
+        facts.add("spacing", "spacing_m",
+                  fixed(spacing->line_m, 3) + " m x " + fixed(spacing->sample_m, 3) +
+                      " m on the ground (lines x samples)",
+                  {{"line", spacing->line_m}, {"sample", spacing->sample_m}});
+}
+
 void add_objects(Facts& facts, const GeneralSAR& product) {
     constexpr const char* kNames[] = {"GSDataFile",   "GSRoi",          "polySAR",         "SamplingConstants",
                                       "StateVectors", "Orbit",          "Pulse",           "AntennaPattern",
@@ -117,6 +146,7 @@ int show_info(const InfoOptions& options) {
     if (product.GSexists(gsOrbit)) add_orbit(facts, product.orbit);
     if (const RasterDescription* raster = described_raster(product)) add_raster(facts, *raster);
     if (product.GSexists(gsSamplingConstants)) add_sampling(facts, product.samplingConstants);
+    add_geometry(facts, options.header, product);
     add_corners(facts, product);
     add_objects(facts, product);
     options.json ? print_json(facts.json()) : print(facts.text(20));

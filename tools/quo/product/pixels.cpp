@@ -1,0 +1,64 @@
+#include "pixels.h"
+
+#include "failure.h"
+#include "product.h"
+#include "scene.h"
+
+namespace tool {
+namespace {
+
+double distance(const GrPtGeometry& a, const GrPtGeometry& b) {
+    return norm(quo::load(a.point_m) - quo::load(b.point_m));
+}
+
+}  // namespace
+
+bool take_grid(const std::string& header, const GeneralSAR& product, ImageGrid_Obj& grid) {
+    if (grid.readhdr(header.c_str()) == QUO_OK) return true;
+    return product.GSexists(gsRoi) && product.roi.Roi.isNULL() == 0 && grid.setRegion(product.roi.Roi) == QUO_OK;
+}
+
+Pixels::Pixels(const std::string& header, GeneralSAR& product) : product_{product} {
+    const RasterDescription* const raster = described_raster(product);
+    if (raster == nullptr) throw Failure(header + ": describes no raster");
+    lines_ = raster->NrOfLinesPerImage;
+    samples_ = raster->NrOfPixelsPerLine;
+    if (!product.GSexists(gsOrbit)) throw Failure(header + ": no state vectors");
+    if (!product.GSexists(gsDataSetInfo)) throw Failure(header + ": no look side (DataSetInfo/LookDirection)");
+    if (const std::string uneven = uneven_vectors(product.orbit); !uneven.empty())
+        throw Failure(header + ": " + uneven);
+    if (!take_grid(header, product, grid_))
+        throw Failure(header + ": neither a pixel grid (section ImageGrid) nor a region (section ROI)");
+}
+
+bool Pixels::known(const std::string& header, GeneralSAR& product) {
+    ImageGrid_Obj grid;
+    return described_raster(product) != nullptr && product.GSexists(gsOrbit) && product.GSexists(gsDataSetInfo) &&
+           uneven_vectors(product.orbit).empty() && take_grid(header, product, grid);
+}
+
+std::optional<Pixels::Times> Pixels::times(double line, double sample) const {
+    Times times{};
+    std::int32_t status = QUO_OK;
+    const int refused = grid_.pixelTimes({1, &line, &sample}, {&times.azimuth_s, &times.range_s, &status});
+    if (refused != QUO_OK || status != QUO_OK) return std::nullopt;
+    return times;
+}
+
+std::optional<GrPtGeometry> Pixels::geometry(double line, double sample) const {
+    const auto at = times(line, sample);
+    GrPtGeometry geometry{};
+    if (!at || product_.orbit.SVGetGeometry(at->azimuth_s, at->range_s, 0.0, &geometry) != QUO_OK)
+        return std::nullopt;
+    return geometry;
+}
+
+std::optional<Pixels::Spacing> Pixels::ground_spacing() const {
+    const double line = 0.5 * (lines_ - 1), sample = 0.5 * (samples_ - 1);
+    const auto here = geometry(line, sample), below = geometry(line + 1.0, sample),
+               beside = geometry(line, sample + 1.0);
+    if (!here || !below || !beside) return std::nullopt;
+    return Spacing{distance(*here, *below), distance(*here, *beside)};
+}
+
+}  // namespace tool
