@@ -86,6 +86,11 @@ public:
      * dropped. 0; 1 for a region without a step. */
     int setRegion(const ROI_Obj& region);
 
+    /** Makes it the grid of a raster that was cut out of this one's, at another sampling or the same: the raster's
+     * pixel (0, 0) is (line, sample) of this grid's raster, and its lines and samples are so many of this one's
+     * apart. 0; 1 for steps not above 0, and for lines of bursts at another sampling; nothing changes then. */
+    int cut(double line, double sample, double line_step, double sample_step);
+
     /** Whether steps and lists are such that pixels have times. */
     [[nodiscard]] bool isComplete() const;
     /** Times of pixels. @return 0 or 1 */
@@ -101,8 +106,8 @@ public:
     double GroundStep_m = 0.0;       ///< from sample to sample; 0 in slant range
     double DelayShare = 0.0;         ///< share of the delay that is left in the line times
     double DelayReference_s = 0.0;   ///< range time at which nothing is left
-    std::int32_t FirstLine = 0;      ///< line of the grid that is the raster's line 0
-    std::int32_t FirstSample = 0;    ///< sample of the grid that is the raster's sample 0
+    double FirstLine = 0.0;          ///< line of the grid that is the raster's line 0
+    double FirstSample = 0.0;        ///< sample of the grid that is the raster's sample 0
     std::int32_t LinesPerBurst = 0;  ///< lines of each burst; 0 without bursts
     std::int32_t Bursts = 0;         ///< number of bursts
     std::int32_t GroundLists = 0;    ///< number of polynomials from ground to slant range

@@ -24,6 +24,7 @@
 #include "quo_base/acquisition.h"
 #include "quo_base/datafile.h"
 #include "quo_base/dataset_info.h"
+#include "quo_base/derived_raster.h"
 #include "quo_base/generalSAR.h"
 #include "quo_base/generalSAR_configuration.h"
 #include "quo_base/generalSARorbit.h"

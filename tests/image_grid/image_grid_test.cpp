@@ -99,8 +99,9 @@ TEST(ImageGrid, CutKeepsTheBitsOfEveryTime) {
     make_bursts(whole);
     ASSERT_EQ(whole.writehdr(report.file("grid.hdr").c_str()), 0);
     ASSERT_EQ(cut.readhdr(report.file("grid.hdr").c_str()), 0);
-    cut.FirstLine += 37;
-    cut.FirstSample += 111;
+    ASSERT_EQ(cut.cut(37.0, 111.0, 1.0, 1.0), 0);
+    EXPECT_EQ(cut.cut(0.0, 0.0, 2.0, 1.0), 1);  // lines of bursts
+    EXPECT_EQ(cut.cut(0.0, 0.0, 1.0, 0.0), 1);
     for (const double line : {0.0, 42.0, 150.0}) {
         const double sample = 5.0, other_line = line + 37.0, other_sample = sample + 111.0;
         double of_cut[2], of_whole[2];
@@ -109,6 +110,22 @@ TEST(ImageGrid, CutKeepsTheBitsOfEveryTime) {
         EXPECT_NEAR(of_cut[0], of_whole[0], 1e-9);
         EXPECT_NEAR(of_cut[1], of_whole[1], 1e-17);
         EXPECT_NEAR(find(cut, line, sample).line, line, 2e-4);
+    }
+}
+
+TEST(ImageGrid, AnotherSamplingKeepsThePlaces) {
+    ImageGrid_Obj ground;
+    make_ground(ground);
+    ASSERT_EQ(ground.cut(6.0, 9.0, 0.75, 1.5), 0);
+    ImageGrid_Obj whole;
+    make_ground(whole);
+    for (const double at : {0.0, 4.0, 20.0}) {
+        const double line = 6.0 + 0.75 * at, sample = 9.0 + 1.5 * at;
+        double of_cut[2], of_whole[2];
+        ASSERT_EQ(ground.pixelTimes({1, &at, &at}, {&of_cut[0], &of_cut[1]}), 0);
+        ASSERT_EQ(whole.pixelTimes({1, &line, &sample}, {&of_whole[0], &of_whole[1]}), 0);
+        EXPECT_NEAR(of_cut[0], of_whole[0], 1e-12);
+        EXPECT_NEAR(of_cut[1], of_whole[1], 1e-17);
     }
 }
 

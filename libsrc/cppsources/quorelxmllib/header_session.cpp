@@ -31,7 +31,9 @@ bool same_file(const std::string& a, const char* b) {
 
 }  // namespace
 
-HeaderSession::HeaderSession(const char* file) : file_{text_or_empty(file)}, outer_{innermost} {
+HeaderSession::HeaderSession(const char* file) : HeaderSession{file, file} {}
+HeaderSession::HeaderSession(const char* file, const char* content)
+    : file_{text_or_empty(file)}, content_{text_or_empty(content)}, outer_{innermost} {
     innermost = this;  // not before the name is stored, which may throw
 }
 
@@ -77,9 +79,9 @@ std::shared_ptr<HeaderDocument> HeaderSession::document(int& status) {
     status = QUO_OK;
     if (document_) return document_;
     CallFrame frame{"HeaderSession::document", kSource};
-    const int loaded = HeaderDocument::load_or_create(file_.c_str(), document_);
+    const int loaded = HeaderDocument::load_or_create(content_.c_str(), document_);
     if (loaded != QUO_OK) {
-        status = fail_unread(frame, loaded, file_.c_str());
+        status = fail_unread(frame, loaded, content_.c_str());
         if (document_) status = QUO_OK;  // it stands in; saving it fails
         return document_;
     }

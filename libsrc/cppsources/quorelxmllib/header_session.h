@@ -24,6 +24,8 @@ int fail_unread(CallFrame& frame, int status, const char* file) noexcept;
 class HeaderSession {
 public:
     explicit HeaderSession(const char* file);
+    /** The same, beginning with the content of another file in place of the file's own. */
+    HeaderSession(const char* file, const char* content);
     ~HeaderSession();
     HeaderSession(const HeaderSession&) = delete;
     HeaderSession& operator=(const HeaderSession&) = delete;
@@ -58,7 +60,7 @@ public:
     void note_write(int status) noexcept;
 
 private:
-    std::string file_;
+    std::string file_, content_;
     HeaderSession* outer_;
     std::shared_ptr<HeaderDocument> document_;
     int failed_ = QUO_OK, failures_ = 0;

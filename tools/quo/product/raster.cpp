@@ -275,6 +275,12 @@ void NewRaster::commit() {
     say_losses();
 }
 
+void NewRaster::commit(const std::string& from, const RasterDerivation& how) {
+    throw_if_interrupted();
+    require_done(name_, "cannot be written", [&] { return commit_derived(file_, (from + ".hdr").c_str(), how); });
+    say_losses();
+}
+
 void NewRaster::say_losses() const {
     const std::string all = std::to_string(std::int64_t{file_.NrOfLinesPerImage} * file_.NrOfPixelsPerLine);
     const auto say = [&](const std::string& what, std::int64_t samples) {

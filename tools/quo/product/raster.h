@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "quo_base/datafile.h"
+#include "quo_base/derived_raster.h"
 
 namespace tool {
 
@@ -106,6 +107,8 @@ public:
      * on standard error how many of the samples written could not be kept, if any. Throws Failure, and
      * Interrupted. */
     void commit();
+    /** The same for a raster that came of another one: it gets that one's whole header, made to fit. */
+    void commit(const std::string& from, const RasterDerivation& how);
     /** No value written from now on is beyond the type: looking for one would cost a third of a copy's time. */
     void expect_no_losses() { counts_losses_ = false; }
 

@@ -137,7 +137,8 @@ public:
 
     void run() {
         copy_tiles();
-        out_.commit();
+        out_.commit(options_.in,
+                    {static_cast<double>(lines_.first), static_cast<double>(samples_.first), 1.0, 1.0});
     }
 
 private:

@@ -160,7 +160,8 @@ public:
 
     void run() {
         options_.lines > 0 ? by_strips() : by_lines();
-        out_.commit();
+        const double lines = in_.NrOfLinesPerImage, samples = in_.NrOfPixelsPerLine;
+        out_.commit(options_.in, {0.0, 0.0, lines / to().NrOfLinesPerImage, samples / to().NrOfPixelsPerLine});
     }
 
 private:

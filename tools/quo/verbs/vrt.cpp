@@ -57,7 +57,7 @@ std::vector<double> line_places(const Pixels& pixels, int count) {
     std::vector<double> places;
     for (int burst = 0; burst < grid.Bursts; ++burst)
         for (const int line : {burst * grid.LinesPerBurst, (burst + 1) * grid.LinesPerBurst - 1})
-            if (const int place = line - grid.FirstLine; place >= 0 && place < pixels.lines())
+            if (const double place = line - grid.FirstLine; place >= 0.0 && place < pixels.lines())
                 places.push_back(place);
     return places;
 }

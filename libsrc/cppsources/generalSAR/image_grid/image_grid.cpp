@@ -170,8 +170,23 @@ int Obj::setRegion(const ROI_Obj& region) {
     return frame.success();
 }
 
+int Obj::cut(double line, double sample, double line_step, double sample_step) {
+    quo::CallFrame frame{"ImageGrid_Obj::cut", kSource};
+    const bool steps =
+        line_step > 0.0 && sample_step > 0.0 && std::isfinite(line_step + sample_step + line + sample);
+    if (!steps) return frame.fail(QUO_REFUSED, "The steps of a cut are above 0");
+    if (Bursts > 0 && line_step != 1.0) return frame.fail(QUO_REFUSED, "Lines of bursts keep their sampling");
+    FirstLine = (FirstLine + line) / line_step;
+    FirstSample = (FirstSample + sample) / sample_step;
+    LineStep_s *= line_step;
+    SampleStep_s *= sample_step;
+    GroundStep_m *= sample_step;
+    return frame.success();
+}
+
 bool Obj::isComplete() const {
-    const double numbers[] = {Epoch_s, FirstLine_s, LineStep_s, FirstSample_s, DelayShare, DelayReference_s};
+    const double numbers[] = {Epoch_s,    FirstLine_s,      LineStep_s, FirstSample_s,
+                              DelayShare, DelayReference_s, FirstLine,  FirstSample};
     const auto sizes = [](const std::vector<double>& array, std::int64_t count) {
         return count >= 0 && array.size() == static_cast<std::size_t>(count) &&
                std::ranges::all_of(array, [](double value) { return std::isfinite(value); });

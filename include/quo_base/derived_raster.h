@@ -1,0 +1,37 @@
+#ifndef QUO_BASE_DERIVED_RASTER_H
+#define QUO_BASE_DERIVED_RASTER_H
+
+#include "quo_base/api.h"
+#include "quo_base/datafile.h"
+
+/** @file
+ * Rasters that are made of others: cuts and other samplings, which keep the product's description and geometry. */
+
+#ifdef __cplusplus
+
+/** How a raster came of another one: its pixel (0, 0) is the other's (first_line, first_sample), and its lines and
+ * samples are so many of the other's apart. */
+struct RasterDerivation {
+    double first_line = 0.0;    ///< lines of the other raster before this one's first
+    double first_sample = 0.0;  ///< samples before the first
+    double line_step = 1.0;     ///< lines of the other raster from line to line
+    double sample_step = 1.0;   ///< its samples from sample to sample
+};
+
+/** Completes a raster that BufferFile::create() started, as BufferFile::commit() does, with the whole header of
+ * the raster that it came of.
+ *
+ * All sections of that header are taken over, and those that place the raster are made to fit: "ImageGrid" (made
+ * of the region where the other header has none, so that every pixel keeps its times), "ROI" where it had the
+ * other raster's size, sampling rates that are the image's own, and corner points that the orbit gives. A header
+ * that stood at the raster's place is replaced.
+ * @param raster  its description is the new raster's
+ * @param header  header of the other raster; it may be the new one's own place
+ * @param how     where its pixels come from
+ * @return as BufferFile::commit(); 1 also for steps that are not above 0, for lines of bursts at another sampling,
+ * and for a header that is there but cannot be read. The unfinished raster goes then. */
+QUO_BASE_API int commit_derived(BufferFile& raster, const char* header, const RasterDerivation& how);
+
+#endif
+
+#endif
