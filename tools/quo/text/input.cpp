@@ -32,17 +32,27 @@ LineReader::~LineReader() {
     if (owned_) close(descriptor_);
 }
 
-bool LineReader::refill() {
+std::size_t LineReader::read_some(char* to, std::size_t room) {
     ssize_t got = 0;
     do {
         throw_if_interrupted();
-        got = read(descriptor_, block_.data(), block_.size());
+        got = read(descriptor_, to, room);
     } while (got < 0 && errno == EINTR);
     if (got < 0) throw Failure(name_ + ": " + system_cause());
-    begin_ = 0;
-    end_ = static_cast<std::size_t>(got);
     bytes_read_ += got;
-    return got > 0;
+    return static_cast<std::size_t>(got);
+}
+
+bool LineReader::refill() {
+    begin_ = 0;
+    end_ = read_some(block_.data(), block_.size());
+    return end_ > 0;
+}
+
+/** Of the line behind the last one. */
+void LineReader::require_length(std::size_t length) const {
+    if (length > kLongestLine)
+        throw Failure(name_ + ": line " + std::to_string(line_number_ + 1) + " is longer than 1 MiB");
 }
 
 bool LineReader::next(std::string& line) {
@@ -53,8 +63,7 @@ bool LineReader::next(std::string& line) {
         const char* last = block_.data() + end_;
         const char* feed = std::find(first, last, '\n');
         line.append(first, feed);
-        if (line.size() > kLongestLine)
-            throw Failure(name_ + ": line " + std::to_string(line_number_ + 1) + " is longer than 1 MiB");
+        require_length(line.size());
         found = true;
         begin_ = static_cast<std::size_t>(feed - block_.data());
         if (feed != last) {
@@ -65,6 +74,27 @@ bool LineReader::next(std::string& line) {
     if (found) ++line_number_;
     if (!line.empty() && line.back() == '\r') line.pop_back();
     return found;
+}
+
+std::string LineReader::next_lines() {
+    std::string text{block_.data() + begin_, end_ - begin_};
+    std::size_t whole = 0;  // what of it is whole lines
+    for (std::size_t full = kBlock; whole == 0; full += kBlock) {
+        std::size_t filled = text.size(), got = 1;
+        text.resize(full);
+        for (; filled < full && got > 0; filled += got) got = read_some(text.data() + filled, full - filled);
+        text.resize(filled);
+        // The last line may lack its line feed; only the first can have begun in an earlier round.
+        whole = got == 0 ? filled : text.rfind('\n') + 1;
+        require_length(std::min(text.find('\n'), filled));
+        if (got == 0) break;
+    }
+    line_number_ += std::count(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(whole), '\n');
+    if (whole > 0 && text[whole - 1] != '\n') ++line_number_;
+    begin_ = 0;
+    end_ = text.copy(block_.data(), block_.size(), whole);
+    text.resize(whole);
+    return text;
 }
 
 }  // namespace tool
