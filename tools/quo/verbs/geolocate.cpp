@@ -284,9 +284,9 @@ private:
         points_.doppler_hz[i] = points_.height_m[i] = 0.0;
     }
     void write(const Rows& rows) {
-        auto& [text, complaints, count, bytes_read] = solved_;
+        std::string& text = solved_.text;
         text.clear();
-        complaints.clear();
+        solved_.complaints.clear();
         std::size_t i = 0;
         rows.each([&](std::string_view line, std::int64_t number) {
             auto& cause = defects_[i];
@@ -298,7 +298,7 @@ private:
                 if (status == 0) append_exact(text, points_.out[k][i]);
             }
             text.append(",").append(std::to_string(status)).append("\n");
-            if (cause) complaints.push_back({number, std::move(*cause)});
+            if (cause) solved_.complaints.push_back({number, std::move(*cause)});
             ++i;
         });
     }
