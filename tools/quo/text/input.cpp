@@ -15,6 +15,7 @@ namespace {
 
 constexpr std::size_t kBlock = 1 << 16;
 constexpr std::size_t kLongestLine = 1 << 20;
+constexpr std::size_t kMostOfLines = 4 * kLongestLine;  // that are given out together
 
 }  // namespace
 
@@ -76,21 +77,27 @@ bool LineReader::next(std::string& line) {
     return found;
 }
 
-std::string LineReader::next_lines() {
+std::string LineReader::next_lines(std::size_t most) {
+    const std::int64_t last = line_number_ + static_cast<std::int64_t>(most);
     std::string text{block_.data() + begin_, end_ - begin_};
     std::size_t whole = 0;  // what of it is whole lines
-    for (std::size_t full = kBlock; whole == 0; full += kBlock) {
-        std::size_t filled = text.size(), got = 1;
-        text.resize(full);
-        for (; filled < full && got > 0; filled += got) got = read_some(text.data() + filled, full - filled);
-        text.resize(filled);
-        // The last line may lack its line feed; only the first can have begun in an earlier round.
-        whole = got == 0 ? filled : text.rfind('\n') + 1;
-        require_length(std::min(text.find('\n'), filled));
-        if (got == 0) break;
+    const auto is_enough = [&] { return line_number_ == last || whole >= kMostOfLines; };
+    while (true) {
+        for (std::size_t feed = 0; !is_enough() && (feed = text.find('\n', whole)) != text.npos; ++line_number_) {
+            require_length(feed - whole);
+            whole = feed + 1;
+        }
+        if (is_enough()) break;
+        require_length(text.size() - whole);
+        const std::size_t filled = text.size();
+        text.resize(filled + kBlock);
+        text.resize(filled + read_some(text.data() + filled, kBlock));
+        if (text.size() > filled) continue;
+        if (whole < filled) ++line_number_;  // the last line may lack its line feed
+        whole = filled;
+        break;
     }
-    line_number_ += std::count(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(whole), '\n');
-    if (whole > 0 && text[whole - 1] != '\n') ++line_number_;
+    // All whole lines before the last piece that was read have been taken: what is left is no longer than a piece.
     begin_ = 0;
     end_ = text.copy(block_.data(), block_.size(), whole);
     text.resize(whole);

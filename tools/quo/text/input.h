@@ -20,9 +20,9 @@ public:
     /** The next line, without line feed and carriage return; false at the end. The last line may lack its line
      * feed. */
     bool next(std::string& line);
-    /** The next lines as they stand, some 64 KiB of them, whatever pieces the input comes in; nothing at the end.
-     * line_number() is then that of the last. */
-    std::string next_lines();
+    /** The next lines as they stand, so many at most, or fewer where these take 4 MiB, whatever pieces the input
+     * comes in; nothing at the end. line_number() is then that of the last. */
+    std::string next_lines(std::size_t most);
 
     /** How the input is named in messages. */
     const std::string& name() const { return name_; }

@@ -78,9 +78,9 @@ bool Table::next() {
     return false;
 }
 
-std::optional<Rows> Table::next_rows() {
+std::optional<Rows> Table::next_rows(std::size_t most) {
     const std::int64_t before = input_.line_number();
-    Rows rows{input_.next_lines(), before, input_.line_number(), input_.bytes_read()};
+    Rows rows{input_.next_lines(most), before, input_.line_number(), input_.bytes_read()};
     if (rows.text.empty()) return std::nullopt;
     return rows;
 }

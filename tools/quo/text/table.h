@@ -88,8 +88,8 @@ public:
     /** Goes to the next row; false at the end. */
     bool next();
     const Row& row() const { return row_; }
-    /** The next rows, nothing at the end. row() stays behind. */
-    std::optional<Rows> next_rows();
+    /** The rows of the next lines, so many at most; nothing at the end. row() stays behind. */
+    std::optional<Rows> next_rows(std::size_t most);
     /** The row's numbers in some columns; throws Failure for a row with a defect, or that lacks one of them. */
     std::vector<double> numbers(std::span<const std::size_t> columns) const;
     /** "file: line 17", for messages about a row: the present one, unless told. */

@@ -324,6 +324,7 @@ private:
 };
 
 int geolocate_table(Scene& scene, const GeolocateOptions& options, const Direction& direction) {
+    constexpr std::size_t kLinesAtOnce = 4096;
     Table table{options.input};
     const Columns columns{table, options, direction};
     if (&direction == &kToGround) scene.require_look_side();
@@ -345,7 +346,7 @@ int geolocate_table(Scene& scene, const GeolocateOptions& options, const Directi
             progress.show(solved->bytes_read, table.input().bytes_in_all(), rows += solved->rows);
         };
         blocks::in_order(
-            options.threads, [&] { return table.next_rows(); },
+            options.threads, [&] { return table.next_rows(kLinesAtOnce); },
             [&] {
                 return RowSolver{scene, columns, direction};
             },
