@@ -393,24 +393,19 @@ constexpr const char* kDetails =
 
 }  // namespace
 
-void add_geolocate(CLI::App& app, Job& job) {
-    const auto [command, options] = add_verb(app, job, "geolocate", kAbout, geolocate);
-    command->footer(kDetails);
-    command->add_option("HEADER", options.header, "Product header with the orbit")->required();
-    command->add_option("--to", options.direction, "Which way")
-        ->required()
-        ->check(CLI::IsMember({"ground", "radar"}));
-    command->add_option("--input", options.input, "Table to read, - for standard input")->capture_default_str();
-    command->add_option("--output", options.output, "Table to write, - for standard output")
-        ->capture_default_str();
-    command->add_flag("--precise", options.precise, "First guess on the polynomial through the whole orbit");
-    command->add_option("--wavelength", options.wavelength_m, "Wavelength in m, instead of the header's");
-    command->add_option("--look", options.look, "Look side, instead of the header's")
-        ->check(CLI::IsMember({"right", "left"}));
-    command->add_option("--height", options.height_m, "Height of all ground points in m, instead of a column's");
-    command->add_option("--resample", options.resample_s, "State vectors at most so many seconds apart");
-    add_waitbar_option(*command, options.waitbar);
-    add_threads_option(*command, options.threads);
+void add_geolocate(Command& program) {
+    auto [command, options] = add_verb(program, "geolocate", kAbout, geolocate);
+    command.details(kDetails);
+    command.needs("HEADER", options.header, "Product header with the orbit");
+    command.needs("--to", options.direction, "Which way", {.one_of = {"ground", "radar"}});
+    command.takes("--input", options.input, "Table to read, - for standard input", {.shows_default = true});
+    command.takes("--output", options.output, "Table to write, - for standard output", {.shows_default = true});
+    command.flag("--precise", options.precise, "First guess on the polynomial through the whole orbit");
+    command.takes("--wavelength", options.wavelength_m, "Wavelength in m, instead of the header's");
+    command.takes("--look", options.look, "Look side, instead of the header's", {.one_of = {"right", "left"}});
+    command.takes("--height", options.height_m, "Height of all ground points in m, instead of a column's");
+    command.takes("--resample", options.resample_s, "State vectors at most so many seconds apart");
+    add_block_options(command, options);
 }
 
 }  // namespace tool
