@@ -194,7 +194,7 @@ BENCHMARK(FirstTouch)->UseManualTime();
 /** Two threads beside one, in a process that has two in either case: the last benchmark, since earlier ones are to
  * find a process with one thread. `ratio` is below 0.59 where two allocate at 1.7 times the rate of one. */
 void TwoThreads(benchmark::State& state) {
-    constexpr int kSteps = 200000;
+    constexpr int kSteps = 20000;
     constexpr std::size_t kLive = 100, kSmall = 1000;  // large ones wait for the system's memory
     const auto churn_here = [] { churn(kLive, kSteps, malloc_ckerr, free_ckerr, kSmall); };
     const auto one = [&] { std::jthread{churn_here}.join(); };

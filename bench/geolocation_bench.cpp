@@ -309,6 +309,7 @@ BENCHMARK(geometry_call);
 int main(int argc, char** argv) {
     add_width<4>("forward_arithmetic_4", "inverse_arithmetic_4");
     add_width<8>("forward_arithmetic_8", "inverse_arithmetic_8");
+    const bool widest = quo::array_kernels().width == 8;  // unless QUO_CPU lowers it
     return bench::run(
         argc, argv,
         {
@@ -324,6 +325,10 @@ int main(int argc, char** argv) {
             {"array: the same at a height", "height_array", "height_call", 0.14},
             {"array: all of the geometry / single", "geometry_array", "geometry_call", 0.2},
             {"array: earth2sat / single", "inverse_array", "inverse_call", 0.25},
+            {"array: sat2earth / arithmetic", "forward_array",
+             widest ? "forward_arithmetic_8" : "forward_arithmetic_4", 1.6},
+            {"array: earth2sat / arithmetic", "inverse_array",
+             widest ? "inverse_arithmetic_8" : "inverse_arithmetic_4", 1.6},
             {"kernel, AVX2: sat2earth / single", "forward_lanes_4", "forward_call", 0.18},
             {"kernel, AVX2: earth2sat / single", "inverse_lanes_4", "inverse_call", 0.36},
             {"kernel, AVX2: sat2earth / arithmetic", "forward_lanes_4", "forward_arithmetic_4", 1.6},

@@ -79,7 +79,7 @@ private:
  * @param threads  at least 1; one of them is the caller's own
  * @param next     gives a block (std::optional), or nothing at the end; called by one thread at a time
  * @param make_worker  called for each thread, before any begins: what it gives is called with a block and gives
- * the result
+ * the result, which may be its own: it is not called again before that has been handed on
  * @param hand_on  called with each result, in the order of the blocks, by one thread at a time
  *
  * Throws what the first block that fails, in their order, makes one of them throw; results before it have been

@@ -33,10 +33,8 @@ double given_or(double given, double otherwise) { return given > 0.0 ? given : o
  * section.
  */
 void read_scene(const std::string& scene, GeneralSAR& product) {
-    for (GeneralSAR_Base* part :
-         {static_cast<GeneralSAR_Base*>(&product.samplingConstants),
-          static_cast<GeneralSAR_Base*>(&product.dataSetInfo),
-          static_cast<GeneralSAR_Base*>(&product.stateVectors), static_cast<GeneralSAR_Base*>(&product.orbit)})
+    for (GeneralSAR_Base* part : std::initializer_list<GeneralSAR_Base*>{
+             &product.samplingConstants, &product.dataSetInfo, &product.stateVectors, &product.orbit})
         require(part->readhdr(scene.c_str()), scene + ": cannot be read");
     require(product.orbit.setLambda(product.samplingConstants.lambda_m), scene + ": no wavelength");
 }

@@ -1,19 +1,18 @@
 // Measures point targets in a focused image: position, resolution, sidelobes, phase.
-#include <CLI/CLI.hpp>
 #include <algorithm>
 #include <cstdio>
 #include <string>
 
+#include "../common/command_line.h"
 #include "../common/session.h"
 #include "measure.h"
 
 int main(int argc, char** argv) {
-    CLI::App app{"Measures point targets in a focused image"};
+    command_line::Program app{"Measures point targets in a focused image"};
     std::string image, targets;
-    app.add_option("image", image, "Focused image; its product header is IMAGE.hdr")->required();
-    app.add_option("targets", targets, "Table of targets: name,latitude_deg,longitude_deg,height_m,strength")
-        ->required();
-    CLI11_PARSE(app, argc, argv);
+    app.needs("image", image, "Focused image; its product header is IMAGE.hdr");
+    app.needs("targets", targets, "Table of targets: name,latitude_deg,longitude_deg,height_m,strength");
+    if (const auto status = app.parse(argc, argv)) return *status;
     const example::Files files{{image, image + ".hdr", targets}, {}};
     return example::run_program("Point targets", files, image + ".targets.report.txt", "", 1, [&] {
         const auto found = example::measure(image, example::read_targets(targets));

@@ -168,7 +168,8 @@ private:
 /** Compresses the raw lines into the intermediate raster. */
 void Processor::compress_range() {
     const int raw_samples = product_.roi.Roi.Samples, lines = product_.roi.Roi.Lines;
-    const std::int64_t block_size = std::int64_t{conf_.LinesInBlock} * conf_.SamplesInBlock;
+    // Several in the room of a block in azimuth, which there are few of: the threads end at nearly the same time.
+    const std::int64_t block_size = std::int64_t{conf_.LinesInBlock} * conf_.SamplesInBlock / 4;
     const int block_lines = static_cast<int>(std::clamp<std::int64_t>(block_size / raw_samples, 1, lines));
     check_memory(block_lines, raw_samples);
     std::vector<std::unique_ptr<RangeWorker>> workers;
@@ -303,9 +304,9 @@ void Processor::focus_azimuth() {
     const auto write = [&](const Done& done) {
         stopwatch_.add(done.stopwatch);
         stopwatch_.time(kWriting, [&] { write_block(*done.block, done.piece.line, done.piece.sample); });
-        const double strips =
-            done.piece.line + layout_.step_lines * static_cast<double>(done.piece.sample) / layout_.samples;
-        progress_.show(kRangeShare + (1.0 - kRangeShare) * strips / layout_.lines);
+        const int strip = std::min(layout_.step_lines, layout_.lines - done.piece.line);
+        const double lines = done.piece.line + strip * static_cast<double>(done.piece.sample) / layout_.samples;
+        progress_.show(kRangeShare + (1.0 - kRangeShare) * lines / layout_.lines);
     };
     auto worker = workers.begin();
     blocks::in_order(

@@ -1,10 +1,9 @@
 // A small range-Doppler processor for stripmap data.
-#include <CLI/CLI.hpp>
 #include <algorithm>
 #include <cstdio>
 #include <string>
 
-#include "../common/blocks.h"
+#include "../common/command_line.h"
 #include "../common/session.h"
 #include "focus.h"
 
@@ -27,20 +26,18 @@ void print_profile(const example::Stopwatch& watch) {
 }  // namespace
 
 int main(int argc, char** argv) {
-    CLI::App app{"Focuses stripmap data into a single-look complex image"};
+    command_line::Program app{"Focuses stripmap data into a single-look complex image"};
     example::FocusJob job;
     std::string configuration;
     bool verbose = false;
-    app.add_option("raw", job.raw, "Raw raster; its product header is RAW.hdr")->required();
-    app.add_option("image", job.image, "Image to make, with the header IMAGE.hdr")->required();
-    app.add_option("--configuration", configuration, "File with AzimuthConf and generalProcessingConf");
-    app.add_option("--height", job.height_m, "Mean height of the scene above the ellipsoid, m");
-    job.threads = blocks::all_processors();
-    app.add_option("--threads", job.threads, "Threads to work with; all processors unless told")
-        ->check(CLI::Range(1, 1024));
-    app.add_flag("--waitbar", job.waitbar, "Tell the progress as commands of a waitbar, on standard error");
-    app.add_flag("--verbose", verbose, "Print what the time went into");
-    CLI11_PARSE(app, argc, argv);
+    app.needs("raw", job.raw, "Raw raster; its product header is RAW.hdr");
+    app.needs("image", job.image, "Image to make, with the header IMAGE.hdr");
+    app.takes("--configuration", configuration, "File with AzimuthConf and generalProcessingConf");
+    app.takes("--height", job.height_m, "Mean height of the scene above the ellipsoid, m");
+    app.threads(job.threads);
+    app.flag("--waitbar", job.waitbar, "Tell the progress as commands of a waitbar, on standard error");
+    app.flag("--verbose", verbose, "Print what the time went into");
+    if (const auto status = app.parse(argc, argv)) return *status;
 
     AzimuthConf azimuth;
     generalProcessingConf processing;

@@ -1,5 +1,3 @@
-#include <algorithm>
-#include <cstdio>
 #include <filesystem>
 #include <new>
 #include <string>
@@ -25,65 +23,40 @@ bool is_file(const std::string& name) {
 
 // A product is known by either of its names. A file that is a header itself is the one that is meant, even with
 // another one beside it.
-std::string header_name(const std::string& name) {
+std::string header_name(std::string name) {
     if (name.ends_with(".hdr") || !is_file(name + ".hdr")) return name;
     return is_file(name) && tool::Document::in(name) ? name : name + ".hdr";
 }
-std::string raster_name(const std::string& name) {
+std::string raster_name(std::string name) {
     return name.ends_with(".hdr") && !is_file(name + ".hdr") ? name.substr(0, name.size() - 4) : name;
 }
 
 // What an argument is called tells what it names, in every verb.
-void take_either_name(CLI::App& app) {
-    constexpr std::string_view kHeaders[] = {"HEADER", "MASTER", "SLAVE", "header"}, kRasters[] = {"RASTER", "IN"};
-    for (CLI::App* verb : app.get_subcommands({})) {
-        for (CLI::Option* option : verb->get_options()) {
-            const std::string name = option->get_single_name();
-            if (std::ranges::find(kHeaders, name) != std::end(kHeaders)) option->transform(header_name);
-            if (std::ranges::find(kRasters, name) != std::end(kRasters)) option->transform(raster_name);
-        }
-    }
-}
+constexpr std::string_view kHeaders[] = {"HEADER", "MASTER", "SLAVE", "header"}, kRasters[] = {"RASTER", "IN"};
 
-const CLI::App* chosen_verb(const CLI::App& app) {
-    const auto chosen = app.get_subcommands();
-    return chosen.empty() ? nullptr : chosen.front();
-}
-
-std::string verbs_of(const CLI::App& app) {
-    std::string names;
-    for (const CLI::App* verb : app.get_subcommands([](const CLI::App*) { return true; }))
-        names += (names.empty() ? "" : ", ") + verb->get_name();
-    return names;
-}
-
-/** What is wrong with the command line, and where the user finds help on it. */
-std::string wrong_use(const CLI::App& app, const std::string& what, const char* first_word) {
-    const CLI::App* verb = chosen_verb(app);
-    const std::string_view word = first_word != nullptr ? first_word : "";
-    if (!verb && !word.starts_with('-'))
-        return (word.empty() ? "no verb" : "no verb " + std::string{word}) + "; there are " + verbs_of(app);
-    std::string help = "quo";
-    for (; verb; verb = chosen_verb(*verb)) help += " " + verb->get_name();
-    return what + " (see " + help + " --help)";
+/** Says what is wrong with the command line, and where the user finds help on it. */
+std::string wrong_use(const command_line::Program& program, const std::string& what, std::string_view first_word) {
+    std::string help = "quo", verbs;
+    for (const std::string& verb : program.given()) help += " " + verb;
+    if (help != "quo" || first_word.starts_with('-')) return what + " (see " + help + " --help)";
+    for (const std::string& verb : program.verbs()) verbs += (verbs.empty() ? "" : ", ") + verb;
+    return (first_word.empty() ? "no verb" : "no verb " + std::string{first_word}) + "; there are " + verbs;
 }
 
 int run(int argc, char** argv) {
-    CLI::App app{kAbout, "quo"};
-    app.footer(kFooter);
-    app.set_version_flag("--version", "quo " QUO_TOOL_VERSION);
-    app.require_subcommand(1);
-    tool::Job job;
-    for (const auto add : tool::kVerbs) add(app, job);
-    take_either_name(app);
+    command_line::Program program{kAbout, "quo"};
+    program.details(kFooter);
+    program.version("quo " QUO_TOOL_VERSION);
+    for (const auto add : tool::kVerbs) add(program);
+    program.change(kHeaders, header_name);
+    program.change(kRasters, raster_name);
     try {
-        app.parse(argc, argv);
-        return job();
-    } catch (const CLI::ParseError& error) {
-        if (error.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success)) return app.exit(error);
-        throw tool::WrongUse(wrong_use(app, error.what(), argc > 1 ? argv[1] : nullptr));
+        std::string defect;
+        const auto status = program.parse(argc, argv, &defect);
+        if (!defect.empty()) throw tool::WrongUse(defect);
+        return status ? *status : program.run();
     } catch (const tool::WrongUse& wrong) {
-        throw tool::WrongUse(wrong_use(app, wrong.what(), argc > 1 ? argv[1] : nullptr));
+        throw tool::WrongUse(wrong_use(program, wrong.what(), argc > 1 ? argv[1] : ""));
     }
 }
 

@@ -1,6 +1,7 @@
 #include "datafilelib/sample_kernels.h"
 
 #include "datafilelib/kernel_table.h"
+#include "sarutillib/ground/processor_level.h"
 
 namespace quo {
 namespace {
@@ -10,8 +11,7 @@ constexpr std::size_t kSizes[kCellTypes] = {8, 4, 16, 8, 8, 4, 4, 2, 2, 1};
 bool is_cell_type(int code) noexcept { return code >= 0 && code < kCellTypes; }
 
 const KernelTable& table_for_this_processor() noexcept {
-    static const KernelTable& table = __builtin_cpu_supports("avx2") ? kernels_avx2::kTable : kernels_any::kTable;
-    return table;
+    return processor_level() >= ProcessorLevel::kAvx2 ? kernels_avx2::kTable : kernels_any::kTable;
 }
 
 }  // namespace

@@ -14,8 +14,9 @@ namespace {
  * quarter of an hour, or ten for a day. */
 constexpr unsigned kSerialBits = 40;
 
-/** The main thread's stack needs no memory, and lasts as long as the process. */
-CallStack main_stack;
+/** The main thread's stack needs no memory, and lasts as long as the process. Every call writes to it: what other
+ * threads read, such as `tracking`, has no place in its cache lines. */
+alignas(64) CallStack main_stack;
 
 std::atomic<std::uint64_t> threads_met{0};
 

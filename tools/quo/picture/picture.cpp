@@ -3,7 +3,6 @@
 #include <png.h>
 
 #include <csetjmp>
-#include <memory>
 
 #include "failure.h"
 #include "output.h"

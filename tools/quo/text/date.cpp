@@ -1,7 +1,5 @@
 #include "date.h"
 
-#include <cmath>
-
 #include "failure.h"
 #include "number.h"
 #include "quo_base/gen_utils.h"

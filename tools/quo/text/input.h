@@ -20,17 +20,23 @@ public:
     /** The next line, without line feed and carriage return; false at the end. The last line may lack its line
      * feed. */
     bool next(std::string& line);
+    /** The next lines as they stand, so many at most, or fewer where these take 4 MiB, whatever pieces the input
+     * comes in; nothing at the end. line_number() is then that of the last. */
+    std::string next_lines(std::size_t most);
 
     /** How the input is named in messages. */
     const std::string& name() const { return name_; }
-    /** Number of the line that next() gave last, from 1. */
+    /** Number of the line that was given last, from 1. */
     std::int64_t line_number() const { return line_number_; }
     /** Bytes read so far, and of the whole input where it is a regular file (else 0). */
     std::int64_t bytes_read() const { return bytes_read_; }
     std::int64_t bytes_in_all() const { return bytes_in_all_; }
 
 private:
+    /** Bytes that were put to `to`; 0 at the end. */
+    std::size_t read_some(char* to, std::size_t room);
     bool refill();
+    void require_length(std::size_t length) const;
 
     std::string name_;
     int descriptor_;

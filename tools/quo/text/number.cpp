@@ -45,9 +45,10 @@ std::string rough(double value) { return with_digits(value, 3); }
 std::string handy(double value) { return with_digits(value, 10); }
 
 std::string_view trimmed(std::string_view text) {
-    constexpr std::string_view kBlanks = " \t";
-    const std::size_t first = text.find_first_not_of(kBlanks);
-    return first == text.npos ? "" : text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
+    const auto is_blank = [](char c) { return c == ' ' || c == '\t'; };
+    while (!text.empty() && is_blank(text.front())) text.remove_prefix(1);
+    while (!text.empty() && is_blank(text.back())) text.remove_suffix(1);
+    return text;
 }
 
 std::optional<double> finite_number(std::string_view text) {

@@ -40,25 +40,28 @@ void Output::fail() const { throw Failure(name_ + ": " + system_cause()); }
 
 void Output::write(std::string_view text) {
     throw_if_interrupted();
-    if (terminal_)
+    if (terminal_) {
         pending_ += shown_lines(text);  // tables pass on what stood in their input
-    else
+    } else if (text.size() < kBlock) {
         pending_ += text;
+    } else {
+        flush();
+        put(text);
+    }
     if (pending_.size() >= kBlock) flush();
 }
 
 void Output::flush() {
-    throw_if_interrupted();
-    if (!file_) {
-        write_directly();
-    } else if (!file_->write(pending_)) {
-        fail();
-    }
+    put(pending_);
     pending_.clear();
 }
 
-void Output::write_directly() {
-    std::string_view rest = pending_;
+void Output::put(std::string_view rest) {
+    throw_if_interrupted();
+    if (file_) {
+        if (!file_->write(rest)) fail();
+        return;
+    }
     while (!rest.empty()) {
         throw_if_interrupted();
         const ssize_t done = ::write(descriptor_, rest.data(), rest.size());

@@ -31,7 +31,7 @@ public:
     void commit();
 
 private:
-    void write_directly();
+    void put(std::string_view rest);
     [[noreturn]] void fail() const;
 
     std::string name_;

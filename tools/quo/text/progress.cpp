@@ -2,7 +2,6 @@
 
 #include <unistd.h>
 
-#include <CLI/CLI.hpp>
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
@@ -37,10 +36,6 @@ std::string clock_text(double seconds) {
 }
 
 }  // namespace
-
-void add_waitbar_option(CLI::App& command, bool& waitbar) {
-    command.add_flag("--waitbar", waitbar, "Tell the progress on standard error, as commands of a waitbar");
-}
 
 Progress::Progress(const char* waitbar_title)
     : waitbar_{waitbar_title != nullptr},

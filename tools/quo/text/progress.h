@@ -5,14 +5,7 @@
 #include <cstdint>
 #include <string>
 
-namespace CLI {
-class App;
-}
-
 namespace tool {
-
-/** Declares the option --waitbar of a long-running subcommand. */
-void add_waitbar_option(CLI::App& command, bool& waitbar);
 
 /** A bar on standard error for jobs that somebody waits for: it shows itself only on a terminal and only when the
  * job takes longer than half a second, and is wiped away at the end. With a waitbar title it leaves the drawing to

@@ -69,26 +69,19 @@ std::size_t Table::need(std::string_view column) const {
     throw Failure(input_.name() + ": no column " + std::string{column});
 }
 
-bool Table::next_line() {
-    while (input_.next(line_))
-        if (!line_.empty() && line_.front() != '#') return true;
+bool Table::next() {
+    while (input_.next(line_)) {
+        if (!is_row(line_)) continue;
+        row_.take(line_, input_.line_number());
+        return true;
+    }
     return false;
 }
 
-bool Table::next() {
-    if (!next_line()) return false;
-    row_.take(line_, input_.line_number());
-    return true;
-}
-
 std::optional<Rows> Table::next_rows(std::size_t most) {
-    Rows rows;
-    while (rows.lines.size() < most && next_line()) {
-        rows.text += line_;
-        rows.lines.push_back({rows.text.size(), input_.line_number()});
-    }
-    rows.bytes_read = input_.bytes_read();
-    if (rows.lines.empty()) return std::nullopt;
+    const std::int64_t before = input_.line_number();
+    Rows rows{input_.next_lines(most), before, input_.line_number(), input_.bytes_read()};
+    if (rows.text.empty()) return std::nullopt;
     return rows;
 }
 

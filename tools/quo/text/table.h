@@ -1,6 +1,7 @@
 #ifndef QUO_TOOL_TABLE_H
 #define QUO_TOOL_TABLE_H
 
+#include <algorithm>
 #include <cstddef>
 #include <cstdint>
 #include <optional>
@@ -43,23 +44,27 @@ private:
     bool well_quoted_ = true;
 };
 
-/** Some rows of a table as they stand, to be taken apart by whoever works on them. */
-struct Rows {
-    struct Line {
-        std::size_t end;      ///< of its text
-        std::int64_t number;  ///< in the file
-    };
-    std::string text;
-    std::vector<Line> lines;
-    std::int64_t bytes_read = 0;  ///< of the input, up to the last of them
+/** Whether a line of a table holds one of its rows. */
+inline bool is_row(std::string_view line) { return !line.empty() && line.front() != '#'; }
 
-    /** Calls visit(text, number in the file) for each line. */
+/** Some lines of a table as they stand, to be taken apart by whoever works on them. */
+struct Rows {
+    std::string text;
+    std::int64_t before, last;  ///< numbers in the file: of the line before them, and of the last
+    std::int64_t bytes_read;    ///< of the input, up to the last of them
+
+    /** As many as there are, or more. */
+    std::size_t most() const { return static_cast<std::size_t>(last - before); }
+    /** Calls visit(text, number in the file) for each line that is a row. */
     template <typename Visit>
-    void each_line(Visit visit) const {
-        std::size_t begin = 0;
-        for (const Line& line : lines) {
-            visit(std::string_view{text}.substr(begin, line.end - begin), line.number);
-            begin = line.end;
+    void each(Visit visit) const {
+        std::string_view rest{text};
+        for (std::int64_t number = before + 1; !rest.empty(); ++number) {
+            const std::size_t end = std::min(rest.find('\n'), rest.size());
+            std::string_view line = rest.substr(0, end);
+            rest.remove_prefix(std::min(end + 1, rest.size()));
+            if (line.ends_with('\r')) line.remove_suffix(1);
+            if (is_row(line)) visit(line, number);
         }
     }
 };
@@ -83,7 +88,7 @@ public:
     /** Goes to the next row; false at the end. */
     bool next();
     const Row& row() const { return row_; }
-    /** The next rows, so many at most; nothing at the end. row() stays behind. */
+    /** The rows of the next lines, so many at most; nothing at the end. row() stays behind. */
     std::optional<Rows> next_rows(std::size_t most);
     /** The row's numbers in some columns; throws Failure for a row with a defect, or that lacks one of them. */
     std::vector<double> numbers(std::span<const std::size_t> columns) const;
@@ -94,8 +99,6 @@ public:
     const LineReader& input() const { return input_; }
 
 private:
-    bool next_line();
-
     LineReader input_;
     std::vector<std::string> columns_, comments_;
     std::string line_;

@@ -1,5 +1,4 @@
 #include <algorithm>
-#include <cstdint>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -276,7 +275,7 @@ int check(const ConfigOptions& options) {
 }
 
 // quorelException is no std::exception: nothing above main() would know it.
-Job guarded(int (*verb)(const ConfigOptions&), std::shared_ptr<ConfigOptions> options) {
+command_line::Job guarded(int (*verb)(const ConfigOptions&), std::shared_ptr<ConfigOptions> options) {
     return [verb, options = std::move(options)] {
         try {
             return verb(*options);
@@ -288,34 +287,29 @@ Job guarded(int (*verb)(const ConfigOptions&), std::shared_ptr<ConfigOptions> op
 
 }  // namespace
 
-void add_config(CLI::App& app, Job& job) {
-    CLI::App* config =
-        app.add_subcommand("config", "Writes, shows and checks the processors' configuration files");
-    config->require_subcommand(1);
+void add_config(Command& program) {
+    Command config = program.verb("config", "Writes, shows and checks the processors' configuration files");
     auto options = std::make_shared<ConfigOptions>();
-    const auto add = [&](const char* name, const char* about, int (*verb)(const ConfigOptions&)) {
-        CLI::App* command = config->add_subcommand(name, about);
-        command->callback([options, verb, &job] { job = guarded(verb, options); });
-        return command;
+    const auto add = [&](const char* name, const char* about, int (*run)(const ConfigOptions&)) {
+        return config.verb(name, about, guarded(run, options));
     };
 
-    CLI::App* command = add("new", "Writes records with their defaults", write_new);
-    command->add_option("RECORD", options->records, "Records, such as AzimuthConf")->required();
-    command->add_option("-o,--output", options->file, "File to write or to add to, - for standard output")
-        ->required();
-    command->add_flag("--replace", options->replace, "Write records anew that FILE has already");
+    Command command = add("new", "Writes records with their defaults", write_new);
+    command.needs("RECORD", options->records, "Records, such as AzimuthConf");
+    command.needs("-o,--output", options->file, "File to write or to add to, - for standard output");
+    command.flag("--replace", options->replace, "Write records anew that FILE has already");
 
     command = add("show", "Prints the values of a file and what differs from the defaults", show);
-    command->add_option("FILE", options->file, "Configuration file")->required();
-    command->add_flag("--json", options->json, "Print JSON");
+    command.needs("FILE", options->file, "Configuration file");
+    command.flag("--json", options->json, "Print JSON");
 
     command = add("check", "Lists what in a file does not fit the records", check);
-    command->add_option("FILE", options->file, "Configuration file")->required();
-    command->add_flag("--json", options->json, "Print JSON");
+    command.needs("FILE", options->file, "Configuration file");
+    command.flag("--json", options->json, "Print JSON");
 
     command = add("doc", "Prints every parameter: type, unit, bounds, default, meaning",
                   [](const ConfigOptions& chosen) { return document(chosen.records); });
-    command->add_option("RECORD", options->records, "Records to describe; all where none is named");
+    command.takes("RECORD", options->records, "Records to describe; all where none is named");
 }
 
 }  // namespace tool

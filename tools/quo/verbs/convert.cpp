@@ -206,22 +206,20 @@ int convert(const ConvertOptions& options) {
 
 }  // namespace
 
-void add_convert(CLI::App& app, Job& job) {
-    const auto [command, options] =
-        add_verb(app, job, "convert", "Cuts and converts a raster of any size", convert);
-    command->add_option("IN", options.in, "Raster with a side file IN.hdr")->required();
-    command->add_option("OUT", options.out, "Raster to write, with a side file OUT.hdr")->required();
-    command->add_option("--type", options.type, "Cell type of OUT, such as FLOAT32 or SHORT_COMPLEX");
-    command->add_option("--order", options.order, "Byte order of OUT: l little-endian, m big-endian")
-        ->check(CLI::IsMember({"l", "m"}));
-    command->add_option("--lines", options.lines, "Lines A:B, counted from 0, B excluded");
-    command->add_option("--samples", options.samples, "Samples A:B of each line");
-    command->add_option("--prefix", options.prefix, "Line prefixes: keep (default) or drop")
-        ->check(CLI::IsMember({"keep", "drop"}));
-    command->add_option("--scale", options.scale, "Factor for every sample (1), before --offset");
-    command->add_option("--offset", options.offset, "What is added to every sample (0)");
-    add_waitbar_option(*command, options.waitbar);
-    add_threads_option(*command, options.threads);
+void add_convert(Command& program) {
+    auto [command, options] = add_verb(program, "convert", "Cuts and converts a raster of any size", convert);
+    command.needs("IN", options.in, "Raster with a side file IN.hdr");
+    command.needs("OUT", options.out, "Raster to write, with a side file OUT.hdr");
+    command.takes("--type", options.type, "Cell type of OUT, such as FLOAT32 or SHORT_COMPLEX");
+    command.takes("--order", options.order, "Byte order of OUT: l little-endian, m big-endian",
+                  {.one_of = {"l", "m"}});
+    command.takes("--lines", options.lines, "Lines A:B, counted from 0, B excluded");
+    command.takes("--samples", options.samples, "Samples A:B of each line");
+    command.takes("--prefix", options.prefix, "Line prefixes: keep (default) or drop",
+                  {.one_of = {"keep", "drop"}});
+    command.takes("--scale", options.scale, "Factor for every sample (1), before --offset");
+    command.takes("--offset", options.offset, "What is added to every sample (0)");
+    add_block_options(command, options);
 }
 
 }  // namespace tool

@@ -1,5 +1,4 @@
 #include <array>
-#include <cmath>
 #include <nlohmann/json.hpp>
 
 #include "commands.h"
@@ -181,13 +180,13 @@ constexpr const char* kDetails =
 
 }  // namespace
 
-void add_coregister(CLI::App& app, Job& job) {
-    const auto [command, options] = add_verb(app, job, "coregister", kAbout, coregister);
-    command->footer(kDetails);
-    command->add_option("MASTER", options.master, "Header of the master image")->required();
-    command->add_option("SLAVE", options.slave, "Header of the slave image")->required();
-    command->add_option("-o,--output", options.output, "Header document to hold the section REGIST")->required();
-    command->add_flag("--json", options.json, "Print JSON");
+void add_coregister(Command& program) {
+    auto [command, options] = add_verb(program, "coregister", kAbout, coregister);
+    command.details(kDetails);
+    command.needs("MASTER", options.master, "Header of the master image");
+    command.needs("SLAVE", options.slave, "Header of the slave image");
+    command.needs("-o,--output", options.output, "Header document to hold the section REGIST");
+    command.flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

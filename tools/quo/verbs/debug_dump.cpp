@@ -1,6 +1,5 @@
 #include <algorithm>
 #include <array>
-#include <complex>
 #include <cstdint>
 #include <cstring>
 #include <filesystem>
@@ -141,12 +140,12 @@ int show_dump(const DumpOptions& options) {
 
 }  // namespace
 
-void add_debug_dump(CLI::App& app, Job& job) {
-    const auto [command, options] = add_verb(
-        app, job, "debug-dump", "Prints the header words and the first values of a debug dump", show_dump);
-    command->add_option("FILE", options.file, "Dump written by write_debug")->required();
-    command->add_option("--values", options.values, "How many values")->capture_default_str();
-    command->add_flag("--json", options.json, "Print JSON");
+void add_debug_dump(Command& program) {
+    auto [command, options] =
+        add_verb(program, "debug-dump", "Prints the header words and the first values of a debug dump", show_dump);
+    command.needs("FILE", options.file, "Dump written by write_debug");
+    command.takes("--values", options.values, "How many values", {.shows_default = true});
+    command.flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

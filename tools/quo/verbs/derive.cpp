@@ -2,7 +2,6 @@
 #include <array>
 #include <cmath>
 #include <nlohmann/json.hpp>
-#include <optional>
 
 #include "commands.h"
 #include "document.h"
@@ -260,19 +259,18 @@ constexpr const char* kDetails =
 
 }  // namespace
 
-void add_derive(CLI::App& app, Job& job) {
-    const auto [command, options] = add_verb(app, job, "derive", kAboutText, derive);
-    command->footer(kDetails);
-    command->add_option("HEADER", options.header, "Product header, which is changed")->required();
-    command
-        ->add_option("--region", options.region,
-                     "Range start and length, azimuth start and length in s, else the header's section ROI")
-        ->expected(4);
-    command->add_option("--what", options.what, "What to derive, else all that is missing")
-        ->check(CLI::IsMember({"fr", "angles", "ground"}));
-    command->add_flag("--grid", options.in_both_times, "Angles and ground range in both times");
-    command->add_flag("--replace", options.replace, "Also replace polynomials that are there");
-    command->add_flag("--json", options.json, "Print JSON");
+void add_derive(Command& program) {
+    auto [command, options] = add_verb(program, "derive", kAboutText, derive);
+    command.details(kDetails);
+    command.needs("HEADER", options.header, "Product header, which is changed");
+    command.takes("--region", options.region,
+                  "Range start and length, azimuth start and length in s, else the header's section ROI",
+                  {.values = 4});
+    command.takes("--what", options.what, "What to derive, else all that is missing",
+                  {.one_of = {"fr", "angles", "ground"}});
+    command.flag("--grid", options.in_both_times, "Angles and ground range in both times");
+    command.flag("--replace", options.replace, "Also replace polynomials that are there");
+    command.flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

@@ -2,7 +2,6 @@
 #include <cstdint>
 #include <nlohmann/json.hpp>
 #include <optional>
-#include <utility>
 
 #include "commands.h"
 #include "document.h"
@@ -119,28 +118,28 @@ int set_field(const FieldOptions& options) {
     return kFine;
 }
 
-Verb<FieldOptions> add_field_verb(CLI::App& app, Job& job, const char* name, const char* about,
+Verb<FieldOptions> add_field_verb(Command& program, const char* name, const char* about,
                                   int (*run)(const FieldOptions&)) {
-    const auto verb = add_verb(app, job, name, about, run);
-    verb.command->add_option("HEADER", verb.options.header, "XML header file")->required();
-    verb.command->add_option("FIELD", verb.options.field, "Section/Field, such as SamplingConstants/prf_hz")
-        ->required();
+    auto verb = add_verb(program, name, about, run);
+    auto& [command, options] = verb;
+    command.needs("HEADER", options.header, "XML header file");
+    command.needs("FIELD", options.field, "Section/Field, such as SamplingConstants/prf_hz");
     return verb;
 }
 
 }  // namespace
 
-void add_get(CLI::App& app, Job& job) {
-    const auto [command, options] =
-        add_field_verb(app, job, "get", "Prints one field of a header, a line for each value", get_field);
-    command->add_flag("--json", options.json, "Print JSON");
+void add_get(Command& program) {
+    auto [command, options] =
+        add_field_verb(program, "get", "Prints one field of a header, a line for each value", get_field);
+    command.flag("--json", options.json, "Print JSON");
 }
 
-void add_set(CLI::App& app, Job& job) {
-    const auto [command, options] =
-        add_field_verb(app, job, "set", "Changes one field of a header; everything else stays", set_field);
-    command->add_option("VALUE", options.values, "The value, or the values of an array")->required();
-    command->add_flag("--create", options.create, "Make the field where it is missing");
+void add_set(Command& program) {
+    auto [command, options] =
+        add_field_verb(program, "set", "Changes one field of a header; everything else stays", set_field);
+    command.needs("VALUE", options.values, "The value, or the values of an array");
+    command.flag("--create", options.create, "Make the field where it is missing");
 }
 
 }  // namespace tool

@@ -1,6 +1,4 @@
 #include <algorithm>
-#include <cmath>
-#include <limits>
 #include <nlohmann/json.hpp>
 
 #include "commands.h"
@@ -135,16 +133,14 @@ constexpr const char* kDetails =
 
 }  // namespace
 
-void add_fit(CLI::App& app, Job& job) {
-    const auto [command, options] = add_verb(app, job, "fit", kAbout, fit_table);
-    command->footer(kDetails);
-    command->add_option("--degree", options.degree, "Degree of the polynomial")
-        ->required()
-        ->check(CLI::Range(0, kHighestDegree));
-    command->add_option("--input", options.input, "Table to read, - for standard input")->capture_default_str();
-    command->add_option("--x", options.x, "Column of the abscissa, else the first");
-    command->add_option("--y", options.y, "Column of the ordinate, else the second");
-    command->add_flag("--json", options.json, "Print JSON");
+void add_fit(Command& program) {
+    auto [command, options] = add_verb(program, "fit", kAbout, fit_table);
+    command.details(kDetails);
+    command.needs("--degree", options.degree, "Degree of the polynomial", {.within = {{0, kHighestDegree}}});
+    command.takes("--input", options.input, "Table to read, - for standard input", {.shows_default = true});
+    command.takes("--x", options.x, "Column of the abscissa, else the first");
+    command.takes("--y", options.y, "Column of the ordinate, else the second");
+    command.flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

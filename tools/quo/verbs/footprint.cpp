@@ -107,10 +107,9 @@ int footprint(const std::string& header) {
 
 }  // namespace
 
-void add_footprint(CLI::App& app, Job& job) {
-    const auto [command, header] =
-        add_verb(app, job, "footprint", "Prints a product's outline as GeoJSON", footprint);
-    command->add_option("HEADER", header, "Product header")->required();
+void add_footprint(Command& program) {
+    auto [command, header] = add_verb(program, "footprint", "Prints a product's outline as GeoJSON", footprint);
+    command.needs("HEADER", header, "Product header");
 }
 
 }  // namespace tool

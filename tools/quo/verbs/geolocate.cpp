@@ -36,7 +36,7 @@ struct Input {
 
 /** Points that are solved together: what was read of them, and what is found. */
 struct Points {
-    std::array<std::vector<double>, kInputs> in;
+    std::array<std::vector<double>, kInputs> in, position_m;  // the latter of ground points
     std::vector<double> doppler_hz, height_m;  // 0, or what the command line says, where the table has no column
     std::array<std::vector<double>, kOutputs> out;
     std::vector<std::int32_t> status;
@@ -44,6 +44,7 @@ struct Points {
     [[nodiscard]] std::size_t count() const { return status.size(); }
     void resize(std::size_t count) {
         for (auto& values : in) values.resize(count);
+        for (auto& values : position_m) values.resize(count);
         for (auto& values : out) values.resize(count);
         doppler_hz.resize(count);
         height_m.resize(count);
@@ -80,25 +81,51 @@ void to_ground(const Scene& scene, GeneralSAROrbit& /*own*/, Points& points) {
         if (!scene.covers(time_s[i])) points.status[i] = QUO_NOT_SEEN;
 }
 
+GeodeticPoint place_of(const Points& points, std::size_t i) {
+    return {points.in[0][i], points.in[1][i], points.in[2][i]};
+}
+
+/** Finds the positions of ground points: once, since each takes a few sines and cosines. */
+void find_positions(Points& points) {
+    auto& [x, y, z] = points.position_m;
+    for (std::size_t i = 0; i < points.count(); ++i) {
+        const quo::Vec3 p = quo::from_geodetic(place_of(points, i));
+        x[i] = p.x;
+        y[i] = p.y;
+        z[i] = p.z;
+    }
+}
+
+/** Whether what a line leads to from a point lies below its horizon.
+ *
+ * The point is a multiple of its normal and, at right angles, at most a e^2 / 2 = 21.4 km of its meridian: that is
+ * known without trigonometry, and only near the horizon not enough. */
+bool is_below(const quo::Vec3& line, const quo::Vec3& point, const GeodeticPoint& place) {
+    constexpr double kMostBeside_m = 21.5e3, kDeepest_m = -6e6;  // deeper, it may be a negative multiple
+    if (place.height_m > kDeepest_m && dot(line, point) > kMostBeside_m * norm(line)) return false;
+    return dot(line, quo::ellipsoid_normal(place)) < 0.0;
+}
+
 // The equations of range and Doppler know nothing of the Earth in between: a point near the antipode solves them
 // too.
 void refuse_hidden(GeneralSAROrbit& orbit, Points& points) {
+    const auto& [x, y, z] = points.position_m;
     for (std::size_t i = 0; i < points.count(); ++i) {
         if (points.status[i] != QUO_OK) continue;
-        const GeodeticPoint ground{points.in[0][i], points.in[1][i], points.in[2][i]};
+        const quo::Vec3 point{x[i], y[i], z[i]};
         double platform[3];
         const int status = orbit.SVGetPos(points.out[0][i], platform);
-        const quo::Vec3 line = quo::load(platform) - quo::from_geodetic(ground);
-        const bool hidden = dot(line, quo::ellipsoid_normal(ground)) < 0.0;
+        const bool hidden = is_below(quo::load(platform) - point, point, place_of(points, i));
         points.status[i] = status != QUO_OK ? status : hidden ? QUO_NOT_SEEN : QUO_OK;
     }
 }
 
 void to_radar(const Scene& scene, GeneralSAROrbit& own, Points& points) {
     OrbitTargets targets{.count = points.count()};
-    targets.latitude_deg = points.in[0].data();
-    targets.longitude_deg = points.in[1].data();
-    targets.height_m = points.in[2].data();
+    find_positions(points);
+    targets.x_m = points.position_m[0].data();
+    targets.y_m = points.position_m[1].data();
+    targets.z_m = points.position_m[2].data();
     targets.doppler_hz = points.doppler_hz.data();
     require_solved(
         scene.orbit().earth2sat(targets, {points.out[0].data(), points.out[1].data(), points.status.data()}));
@@ -106,9 +133,10 @@ void to_radar(const Scene& scene, GeneralSAROrbit& own, Points& points) {
 }
 
 void to_radar_precisely(const Scene& /*scene*/, GeneralSAROrbit& own, Points& points) {
+    find_positions(points);
+    const auto& [x, y, z] = points.position_m;
     for (std::size_t i = 0; i < points.count(); ++i) {
-        double point[3];
-        quo::store(quo::from_geodetic({points.in[0][i], points.in[1][i], points.in[2][i]}), point);
+        double point[] = {x[i], y[i], z[i]};
         points.status[i] = own.earth2satPrecise(point, &points.out[0][i], &points.out[1][i], points.doppler_hz[i]);
     }
     refuse_hidden(own, points);
@@ -226,47 +254,51 @@ public:
         require_solved(scene.orbit().clone(loaded_.get()));
     }
 
-    Solved operator()(const Rows& rows) {
-        Solved solved;
+    /** What it gives stands until the next call. */
+    const Solved* operator()(const Rows& rows) {
         read(rows);
         require_solved(loaded_->clone(own_.get()));
         direction_->solve(*scene_, *own_, points_);
-        write(rows, solved);
-        solved.rows = static_cast<std::int64_t>(rows.lines.size());
-        solved.bytes_read = rows.bytes_read;
-        return solved;
+        write(rows);
+        solved_.rows = static_cast<std::int64_t>(points_.count());
+        solved_.bytes_read = rows.bytes_read;
+        return &solved_;
     }
 
 private:
     void read(const Rows& rows) {
-        points_.resize(rows.lines.size());
+        points_.resize(rows.most());
         defects_.clear();
         std::size_t i = 0;
-        rows.each_line([&](std::string_view line, std::int64_t number) {
+        rows.each([&](std::string_view line, std::int64_t number) {
             row_.take(line, number);
             defects_.push_back(columns_->read(row_, points_, i));
             if (defects_.back()) clear(i);
             ++i;
         });
+        points_.resize(i);
     }
     /** A point that is none: it is solved along, and nobody asks. */
     void clear(std::size_t i) {
         for (auto& values : points_.in) values[i] = 0.0;
         points_.doppler_hz[i] = points_.height_m[i] = 0.0;
     }
-    void write(const Rows& rows, Solved& solved) {
+    void write(const Rows& rows) {
+        std::string& text = solved_.text;
+        text.clear();
+        solved_.complaints.clear();
         std::size_t i = 0;
-        rows.each_line([&](std::string_view line, std::int64_t number) {
+        rows.each([&](std::string_view line, std::int64_t number) {
             auto& cause = defects_[i];
             const int status = cause ? QUO_REFUSED : points_.status[i];
-            append_row(solved.text, line, number, cause.has_value());
+            append_row(text, line, number, cause.has_value());
             if (!cause && status != 0) cause = "status " + status_text(status);
             for (std::size_t k = 0; k < direction_->outputs.size(); ++k) {
-                solved.text += ',';
-                if (status == 0) append_exact(solved.text, points_.out[k][i]);
+                text += ',';
+                if (status == 0) append_exact(text, points_.out[k][i]);
             }
-            solved.text += status == 0 ? ",0\n" : "," + std::to_string(status) + "\n";
-            if (cause) solved.complaints.push_back({number, std::move(*cause)});
+            text.append(",").append(std::to_string(status)).append("\n");
+            if (cause) solved_.complaints.push_back({number, std::move(*cause)});
             ++i;
         });
     }
@@ -288,10 +320,11 @@ private:
     Points points_;
     Row row_;
     std::vector<std::optional<std::string>> defects_;  // of each row
+    Solved solved_;
 };
 
 int geolocate_table(Scene& scene, const GeolocateOptions& options, const Direction& direction) {
-    constexpr std::size_t kRowsAtOnce = 4096;
+    constexpr std::size_t kLinesAtOnce = 4096;
     Table table{options.input};
     const Columns columns{table, options, direction};
     if (&direction == &kToGround) scene.require_look_side();
@@ -303,17 +336,17 @@ int geolocate_table(Scene& scene, const GeolocateOptions& options, const Directi
     std::int64_t rows = 0, unsolved = 0;
     {
         Progress progress{options.waitbar ? "Geolocating" : nullptr};
-        const auto hand_on = [&](const Solved& solved) {
-            for (const auto& [line_number, cause] : solved.complaints) {
+        const auto hand_on = [&](const Solved* solved) {
+            for (const auto& [line_number, cause] : solved->complaints) {
                 if (++unsolved > kShown) continue;
                 progress.wipe();
                 complain(table.place(line_number) + ": " + cause);
             }
-            output.write(solved.text);
-            progress.show(solved.bytes_read, table.input().bytes_in_all(), rows += solved.rows);
+            output.write(solved->text);
+            progress.show(solved->bytes_read, table.input().bytes_in_all(), rows += solved->rows);
         };
         blocks::in_order(
-            options.threads, [&] { return table.next_rows(kRowsAtOnce); },
+            options.threads, [&] { return table.next_rows(kLinesAtOnce); },
             [&] {
                 return RowSolver{scene, columns, direction};
             },
@@ -360,24 +393,19 @@ constexpr const char* kDetails =
 
 }  // namespace
 
-void add_geolocate(CLI::App& app, Job& job) {
-    const auto [command, options] = add_verb(app, job, "geolocate", kAbout, geolocate);
-    command->footer(kDetails);
-    command->add_option("HEADER", options.header, "Product header with the orbit")->required();
-    command->add_option("--to", options.direction, "Which way")
-        ->required()
-        ->check(CLI::IsMember({"ground", "radar"}));
-    command->add_option("--input", options.input, "Table to read, - for standard input")->capture_default_str();
-    command->add_option("--output", options.output, "Table to write, - for standard output")
-        ->capture_default_str();
-    command->add_flag("--precise", options.precise, "First guess on the polynomial through the whole orbit");
-    command->add_option("--wavelength", options.wavelength_m, "Wavelength in m, instead of the header's");
-    command->add_option("--look", options.look, "Look side, instead of the header's")
-        ->check(CLI::IsMember({"right", "left"}));
-    command->add_option("--height", options.height_m, "Height of all ground points in m, instead of a column's");
-    command->add_option("--resample", options.resample_s, "State vectors at most so many seconds apart");
-    add_waitbar_option(*command, options.waitbar);
-    add_threads_option(*command, options.threads);
+void add_geolocate(Command& program) {
+    auto [command, options] = add_verb(program, "geolocate", kAbout, geolocate);
+    command.details(kDetails);
+    command.needs("HEADER", options.header, "Product header with the orbit");
+    command.needs("--to", options.direction, "Which way", {.one_of = {"ground", "radar"}});
+    command.takes("--input", options.input, "Table to read, - for standard input", {.shows_default = true});
+    command.takes("--output", options.output, "Table to write, - for standard output", {.shows_default = true});
+    command.flag("--precise", options.precise, "First guess on the polynomial through the whole orbit");
+    command.takes("--wavelength", options.wavelength_m, "Wavelength in m, instead of the header's");
+    command.takes("--look", options.look, "Look side, instead of the header's", {.one_of = {"right", "left"}});
+    command.takes("--height", options.height_m, "Height of all ground points in m, instead of a column's");
+    command.takes("--resample", options.resample_s, "State vectors at most so many seconds apart");
+    add_block_options(command, options);
 }
 
 }  // namespace tool

@@ -72,18 +72,16 @@ int import_product(const ImportOptions& options) {
 
 }  // namespace
 
-void add_import(CLI::App& app, Job& job) {
-    const auto [command, options] =
-        add_verb(app, job, "import", "Takes over a Sentinel-1 product: SLC or GRD", import_product);
-    command->add_option("PRODUCT", options.source, "Folder *.SAFE, its manifest, or an annotation file")
-        ->required();
-    command->add_option("OUT", options.raster, "Raster to make, with a header OUT.hdr")->required();
-    command->add_option("--swath", options.swath, "Swath, such as IW1, where there are several");
-    command->add_option("--polarization", options.polarization,
-                        "Polarization, such as VV, where there are several");
-    command->add_option("--orbit", options.orbit, "Orbit file whose vectors take the place of the annotation's");
-    command->add_flag("--link", options.link, "Make OUT a link to the measurement, whose samples are not copied");
-    add_waitbar_option(*command, options.waitbar);
+void add_import(Command& program) {
+    auto [command, options] =
+        add_verb(program, "import", "Takes over a Sentinel-1 product: SLC or GRD", import_product);
+    command.needs("PRODUCT", options.source, "Folder *.SAFE, its manifest, or an annotation file");
+    command.needs("OUT", options.raster, "Raster to make, with a header OUT.hdr");
+    command.takes("--swath", options.swath, "Swath, such as IW1, where there are several");
+    command.takes("--polarization", options.polarization, "Polarization, such as VV, where there are several");
+    command.takes("--orbit", options.orbit, "Orbit file whose vectors take the place of the annotation's");
+    command.flag("--link", options.link, "Make OUT a link to the measurement, whose samples are not copied");
+    command.flag("--waitbar", options.waitbar, "Tell the progress on standard error, as commands of a waitbar");
 }
 
 }  // namespace tool

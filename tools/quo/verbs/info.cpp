@@ -155,10 +155,10 @@ int show_info(const InfoOptions& options) {
 
 }  // namespace
 
-void add_info(CLI::App& app, Job& job) {
-    const auto [command, options] = add_verb(app, job, "info", "What a product is: one screen", show_info);
-    command->add_option("HEADER", options.header, "Product header")->required();
-    command->add_flag("--json", options.json, "Print JSON");
+void add_info(Command& program) {
+    auto [command, options] = add_verb(program, "info", "What a product is: one screen", show_info);
+    command.needs("HEADER", options.header, "Product header");
+    command.flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

@@ -151,15 +151,15 @@ int show_orbit(const OrbitOptions& options) {
 
 }  // namespace
 
-void add_orbit(CLI::App& app, Job& job) {
-    const auto [command, options] = add_verb(
-        app, job, "orbit",
+void add_orbit(Command& program) {
+    auto [command, options] = add_verb(
+        program, "orbit",
         "Shows a header's orbit, what is wrong with it, and position and velocity at chosen times", show_orbit);
-    command->add_option("HEADER", options.header, "Product header with the orbit")->required();
-    CLI::Option* at = command->add_option("--at", options.at, "Time: seconds since 1985, or a date text");
-    command->add_option("--every", options.every_s, "From the first state vector to the last, in steps of seconds")
-        ->excludes(at);
-    command->add_flag("--json", options.json, "Print JSON");
+    command.needs("HEADER", options.header, "Product header with the orbit");
+    command.takes("--at", options.at, "Time: seconds since 1985, or a date text");
+    command.takes("--every", options.every_s, "From the first state vector to the last, in steps of seconds",
+                  {.excludes = "--at"});
+    command.flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

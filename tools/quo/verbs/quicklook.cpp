@@ -207,18 +207,16 @@ int quicklook(const QuicklookOptions& options) {
 
 }  // namespace
 
-void add_quicklook(CLI::App& app, Job& job) {
-    const auto [command, options] =
-        add_verb(app, job, "quicklook", "Shows a raster as a picture: power in dB, multilooked", quicklook);
-    command->add_option("RASTER", options.raster, "Raster with a side file RASTER.hdr")->required();
-    command->add_option("OUT", options.picture, "Picture to write (PNG)")->required();
-    CLI::Option* looks =
-        command->add_option("--looks", options.looks, "Lines x samples averaged into a pixel, such as 4x1");
-    command->add_option("--db", options.db, "Black and white: MIN:MAX in dB, or auto (2nd to 98th percentile)");
-    command->add_option("--width", options.width, "Greatest width in pixels, in place of --looks (1000)")
-        ->excludes(looks);
-    add_waitbar_option(*command, options.waitbar);
-    add_threads_option(*command, options.threads);
+void add_quicklook(Command& program) {
+    auto [command, options] =
+        add_verb(program, "quicklook", "Shows a raster as a picture: power in dB, multilooked", quicklook);
+    command.needs("RASTER", options.raster, "Raster with a side file RASTER.hdr");
+    command.needs("OUT", options.picture, "Picture to write (PNG)");
+    command.takes("--looks", options.looks, "Lines x samples averaged into a pixel, such as 4x1");
+    command.takes("--db", options.db, "Black and white: MIN:MAX in dB, or auto (2nd to 98th percentile)");
+    command.takes("--width", options.width, "Greatest width in pixels, in place of --looks (1000)",
+                  {.excludes = "--looks"});
+    add_block_options(command, options);
 }
 
 }  // namespace tool

@@ -275,18 +275,17 @@ int resample(const ResampleOptions& options) {
 
 }  // namespace
 
-void add_resample(CLI::App& app, Job& job) {
-    const auto [command, options] =
-        add_verb(app, job, "resample", "Changes the number of samples or lines of a raster of any size", resample);
-    command->add_option("IN", options.in, "Raster with a side file IN.hdr")->required();
-    command->add_option("OUT", options.out, "Raster to write, with a side file OUT.hdr")->required();
-    CLI::App* size = command->add_option_group("New size")->require_option(1);
-    size->add_option("--samples", options.samples, "Samples per line")->check(CLI::Range(1, INT_MAX));
-    size->add_option("--lines", options.lines, "Lines")->check(CLI::Range(1, INT_MAX));
-    command->add_option("--centre", options.centre, "Centre of the band in cycles per sample, where it is not 0")
-        ->check(defect_of_centre);
-    add_waitbar_option(*command, options.waitbar);
-    add_threads_option(*command, options.threads);
+void add_resample(Command& program) {
+    auto [command, options] =
+        add_verb(program, "resample", "Changes the number of samples or lines of a raster of any size", resample);
+    command.needs("IN", options.in, "Raster with a side file IN.hdr");
+    command.needs("OUT", options.out, "Raster to write, with a side file OUT.hdr");
+    Command size = command.either("New size");
+    size.takes("--samples", options.samples, "Samples per line", {.within = {{1, INT_MAX}}});
+    size.takes("--lines", options.lines, "Lines", {.within = {{1, INT_MAX}}});
+    command.takes("--centre", options.centre, "Centre of the band in cycles per sample, where it is not 0",
+                  {.defect = defect_of_centre});
+    add_block_options(command, options);
 }
 
 }  // namespace tool

@@ -2,7 +2,6 @@
 #include <cmath>
 #include <complex>
 #include <functional>
-#include <limits>
 #include <memory>
 #include <nlohmann/json.hpp>
 #include <numbers>
@@ -237,15 +236,14 @@ int spectrum(const SpectrumOptions& options) {
 
 }  // namespace
 
-void add_spectrum(CLI::App& app, Job& job) {
-    const auto [command, options] = add_verb(
-        app, job, "spectrum", "Range and azimuth power spectra of a raster, and what they tell", spectrum);
-    command->add_option("RASTER", options.raster, "Raster with a side file RASTER.hdr")->required();
-    command->add_option("OUT", options.picture, "Plot to write (PNG)")->required();
-    command->add_option("--header", options.header, "Header with the sampling rates, for frequencies in Hz");
-    command->add_flag("--json", options.json, "Print JSON");
-    add_waitbar_option(*command, options.waitbar);
-    add_threads_option(*command, options.threads);
+void add_spectrum(Command& program) {
+    auto [command, options] =
+        add_verb(program, "spectrum", "Range and azimuth power spectra of a raster, and what they tell", spectrum);
+    command.needs("RASTER", options.raster, "Raster with a side file RASTER.hdr");
+    command.needs("OUT", options.picture, "Plot to write (PNG)");
+    command.takes("--header", options.header, "Header with the sampling rates, for frequencies in Hz");
+    command.flag("--json", options.json, "Print JSON");
+    add_block_options(command, options);
 }
 
 }  // namespace tool

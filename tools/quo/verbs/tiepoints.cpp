@@ -1,6 +1,5 @@
 #include <algorithm>
 #include <array>
-#include <cmath>
 #include <memory>
 #include <nlohmann/json.hpp>
 #include <optional>
@@ -232,19 +231,18 @@ constexpr const char* kDetails =
 
 }  // namespace
 
-void add_tiepoints(CLI::App& app, Job& job) {
-    const auto [command, options] = add_verb(app, job, "tiepoints", kAbout, check_tiepoints);
-    command->footer(kDetails);
-    command->add_option("HEADER", options.headers, "Product headers")->required();
-    command->add_option("--points", options.points, "Tie points of the one header given");
-    command
-        ->add_option(
-            "--incidence", options.incidence,
-            "What the incidence is measured against; else as the comment \"incidence: geocentric radius\" or "
-            "\"incidence: ellipsoid normal\" says")
-        ->check(CLI::IsMember({"normal", "geocentric"}));
-    command->add_flag("--json", options.json, "Print JSON");
-    add_threads_option(*command, options.threads);
+void add_tiepoints(Command& program) {
+    auto [command, options] = add_verb(program, "tiepoints", kAbout, check_tiepoints);
+    command.details(kDetails);
+    command.needs("HEADER", options.headers, "Product headers");
+    command.takes("--points", options.points, "Tie points of the one header given");
+    command.takes(
+        "--incidence", options.incidence,
+        "What the incidence is measured against; else as the comment \"incidence: geocentric radius\" or "
+        "\"incidence: ellipsoid normal\" says",
+        {.one_of = {"normal", "geocentric"}});
+    command.flag("--json", options.json, "Print JSON");
+    command.threads(options.threads);
 }
 
 }  // namespace tool

@@ -31,12 +31,11 @@ int convert_times(const TimeOptions& options) {
 
 }  // namespace
 
-void add_time(CLI::App& app, Job& job) {
-    const auto [command, options] =
-        add_verb(app, job, "time", "Seconds since 1985 to date texts, and back", convert_times);
-    command->add_option("TIME", options.times, "Seconds, or a date such as \"04-JAN-2022 17:05:58.5\"")
-        ->required();
-    command->add_flag("--json", options.json, "Print JSON");
+void add_time(Command& program) {
+    auto [command, options] =
+        add_verb(program, "time", "Seconds since 1985 to date texts, and back", convert_times);
+    command.needs("TIME", options.times, "Seconds, or a date such as \"04-JAN-2022 17:05:58.5\"");
+    command.flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

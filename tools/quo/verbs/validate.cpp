@@ -112,12 +112,10 @@ private:
         const bool listed = element.count > 1 && !array;  // "1.5, 2.5", the older form of arrays
         if (listed) return;
         if (!array && element.scalar && document.count(path) > 1)
-            return error(element.section, element.name, element.countDefect(count_of(document, path)));
+            return error(element.section, element.name,
+                         element.countDefect(static_cast<std::size_t>(document.count(path))));
         const std::string defect = values_defect(element, fresh, document.values(path));
         if (!defect.empty()) error(element.section, element.name, defect);
-    }
-    static std::size_t count_of(const Document& document, const std::string& path) {
-        return static_cast<std::size_t>(document.count(path));
     }
 
     // Every value must make sense by the rules of its field.
@@ -380,11 +378,11 @@ int validate(const ValidateOptions& options) {
 
 }  // namespace
 
-void add_validate(CLI::App& app, Job& job) {
-    const auto [command, options] =
-        add_verb(app, job, "validate", "Checks a product: bounds, and what does not fit together", validate);
-    command->add_option("HEADER", options.header, "Product header")->required();
-    command->add_flag("--json", options.json, "Print JSON");
+void add_validate(Command& program) {
+    auto [command, options] =
+        add_verb(program, "validate", "Checks a product: bounds, and what does not fit together", validate);
+    command.needs("HEADER", options.header, "Product header");
+    command.flag("--json", options.json, "Print JSON");
 }
 
 }  // namespace tool

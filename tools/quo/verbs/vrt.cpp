@@ -202,10 +202,10 @@ int write_vrt(const std::string& name) {
 
 }  // namespace
 
-void add_vrt(CLI::App& app, Job& job) {
-    const auto [command, name] =
-        add_verb(app, job, "vrt", "Writes RASTER.vrt beside a raster, which GDAL opens", write_vrt);
-    command->add_option("RASTER", name, "Raster with a side file RASTER.hdr")->required();
+void add_vrt(Command& program) {
+    auto [command, name] =
+        add_verb(program, "vrt", "Writes RASTER.vrt beside a raster, which GDAL opens", write_vrt);
+    command.needs("RASTER", name, "Raster with a side file RASTER.hdr");
 }
 
 }  // namespace tool

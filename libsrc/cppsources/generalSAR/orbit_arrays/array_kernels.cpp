@@ -1,5 +1,7 @@
 #include "generalSAR/orbit_arrays/array_kernels.h"
 
+#include "sarutillib/ground/processor_level.h"
+
 namespace quo {
 
 extern const ArrayKernels kKernelsOf2;
@@ -9,9 +11,8 @@ extern const ArrayKernels kKernelsOf4, kKernelsOf8;
 
 const ArrayKernels& array_kernels([[maybe_unused]] int widest) noexcept {
 #if defined(QUO_WIDE_LANES)
-    __builtin_cpu_init();
-    if (widest >= 8 && __builtin_cpu_supports("avx512f") && __builtin_cpu_supports("avx512dq")) return kKernelsOf8;
-    if (widest >= 4 && __builtin_cpu_supports("avx2")) return kKernelsOf4;
+    if (widest >= 8 && processor_level() >= ProcessorLevel::kAvx512) return kKernelsOf8;
+    if (widest >= 4 && processor_level() >= ProcessorLevel::kAvx2) return kKernelsOf4;
 #endif
     return kKernelsOf2;
 }

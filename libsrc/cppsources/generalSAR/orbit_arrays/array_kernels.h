@@ -56,7 +56,7 @@ struct ArrayKernels {
     bool (*inverse)(const OrbitView& orbit, int count, InverseBlock& block) noexcept;
 };
 
-/** The widest kernels for at most so many lanes that were built and that this processor runs. */
+/** The widest kernels for at most so many lanes that were built and that the processor's level has. */
 const ArrayKernels& array_kernels(int widest = 8) noexcept;
 
 }  // namespace quo
