@@ -11,6 +11,8 @@
 #include "document.h"
 #include "failure.h"
 #include "number.h"
+#include "pixels.h"
+#include "product.h"
 #include "quo_base/generalSAR.h"
 
 namespace tool {
@@ -103,6 +105,13 @@ void Scene::use_wavelength(double wavelength_m) {
 void Scene::use_look_sign(int sign) {
     orbit_.setLookSign(sign);
     look_sign_ = sign;
+}
+
+void Scene::take_grid() {
+    GeneralSAR product;
+    read_product(name_, product);
+    if (!tool::take_grid(name_, product, grid_))
+        throw Failure(name_ + ": neither a pixel grid (section ImageGrid) nor a region (section ROI)");
 }
 
 void Scene::require_wavelength() const {

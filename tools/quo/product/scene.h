@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "quo_base/generalSARorbit.h"
+#include "quo_base/image_grid.h"
 
 class GeneralSAR;
 
@@ -43,6 +44,11 @@ public:
     void require_wavelength() const;
     void require_look_side() const;
 
+    /** Takes the pixel grid of the header; throws Failure where it has neither grid nor region. */
+    void take_grid();
+    /** The one that was taken. */
+    const ImageGrid_Obj& grid() const { return grid_; }
+
     /** Brings the state vectors to at most so many seconds apart; see GeneralSAROrbit::SVResample. */
     void resample(double spacing_s);
 
@@ -61,6 +67,7 @@ private:
 
     std::string name_;
     GeneralSAROrbit orbit_;
+    ImageGrid_Obj grid_;
     std::optional<double> wavelength_m_;
     std::optional<int> look_sign_;
 };

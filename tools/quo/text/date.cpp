@@ -25,16 +25,21 @@ std::string iso_text(double seconds) {
     return sec852iso(seconds, text) == 0 ? text : "";
 }
 
+std::optional<double> date_of(std::string_view text) {
+    const std::string copy{text};
+    double seconds = 0.0;
+    if (iso2sec85(copy.c_str(), &seconds) == 0) return seconds;
+    DateFields fields;
+    if (date2str(copy.c_str(), &fields) != 0) return std::nullopt;
+    return ascii2sec85(copy.c_str());
+}
+
 double seconds_of(const std::string& text) {
     if (const auto number = finite_number(text)) return *number;
-    double seconds = 0.0;
-    if (iso2sec85(text.c_str(), &seconds) == 0) return seconds;
-    DateFields fields;
-    if (date2str(text.c_str(), &fields) != 0)
-        throw WrongUse("\"" + text +
-                       "\" is neither seconds nor a date such as \"04-JAN-2022 17:05:58.5\" or "
-                       "\"2022-01-04T17:05:58.5\"");
-    return ascii2sec85(text.c_str());
+    if (const auto seconds = date_of(text)) return *seconds;
+    throw WrongUse("\"" + text +
+                   "\" is neither seconds nor a date such as \"04-JAN-2022 17:05:58.5\" or "
+                   "\"2022-01-04T17:05:58.5\"");
 }
 
 }  // namespace tool

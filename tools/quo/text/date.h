@@ -3,6 +3,7 @@
 
 #include <optional>
 #include <string>
+#include <string_view>
 
 namespace tool {
 
@@ -15,6 +16,9 @@ std::optional<std::string> date_text(double seconds);
 
 /** The ISO 8601 text of such a time, to the microsecond; empty where there is none. */
 std::string iso_text(double seconds);
+
+/** Seconds since 1985 of a date text or an ISO 8601 text; nothing for another. */
+std::optional<double> date_of(std::string_view text);
 
 /** Seconds since 1985 of a number, a date text or an ISO 8601 text. Throws WrongUse where the text is neither. */
 double seconds_of(const std::string& text);

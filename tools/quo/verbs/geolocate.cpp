@@ -8,6 +8,7 @@
 
 #include "apart.h"
 #include "commands.h"
+#include "date.h"
 #include "interrupt.h"
 #include "output.h"
 #include "progress.h"
@@ -20,18 +21,19 @@ namespace {
 struct GeolocateOptions {
     std::string header, direction, input = "-", output = "-", look;
     std::optional<double> wavelength_m, resample_s, height_m;
-    bool precise = false, waitbar = false;
+    bool precise = false, waitbar = false, pixels = false, first = false, iso = false;
     int threads = 0;
 };
 
 constexpr std::size_t kInputs = 3;  // at most
-constexpr std::size_t kOutputs = 9;
+constexpr std::size_t kOutputs = 11;
 
 /** A column that a direction reads, and the values that make sense in it. */
 struct Input {
     const char* name;
     double lowest = -std::numeric_limits<double>::max();
     double highest = std::numeric_limits<double>::max();
+    bool time = false;  // a date will do
 };
 
 /** Points that are solved together: what was read of them, and what is found. */
@@ -39,6 +41,7 @@ struct Points {
     std::array<std::vector<double>, kInputs> in, position_m;  // the latter of ground points
     std::vector<double> doppler_hz, height_m;  // 0, or what the command line says, where the table has no column
     std::array<std::vector<double>, kOutputs> out;
+    std::vector<double> second_line;  // of a point that two bursts see; else not-a-number
     std::vector<std::int32_t> status;
 
     [[nodiscard]] std::size_t count() const { return status.size(); }
@@ -48,6 +51,7 @@ struct Points {
         for (auto& values : out) values.resize(count);
         doppler_hz.resize(count);
         height_m.resize(count);
+        second_line.assign(count, std::numeric_limits<double>::quiet_NaN());
         status.resize(count);
     }
 };
@@ -58,12 +62,14 @@ struct Direction {
     std::span<const char* const> outputs;
     /** `own` is as freshly loaded, whatever block was before. */
     void (*solve)(const Scene& scene, GeneralSAROrbit& own, Points& points);
+    bool ground = false;       // leads to the ground
+    std::size_t line_at = 99;  // where the line stands among the outputs, if it does
 };
 
 constexpr Input kDoppler{"doppler_hz"}, kHeight{"height_m"};
 
 void to_ground(const Scene& scene, GeneralSAROrbit& /*own*/, Points& points) {
-    auto& [x, y, z, latitude, longitude, incidence, look, fm_rate, speed] = points.out;
+    auto& [x, y, z, latitude, longitude, incidence, look, fm_rate, speed, unused_time, unused_range] = points.out;
     const auto& [time_s, range_s, unused] = points.in;
     const OrbitSamples samples{points.count(), time_s.data(), range_s.data(), points.doppler_hz.data(),
                                points.height_m.data()};
@@ -79,6 +85,18 @@ void to_ground(const Scene& scene, GeneralSAROrbit& /*own*/, Points& points) {
     require_solved(scene.orbit().sat2earth(samples, ground));
     for (std::size_t i = 0; i < points.count(); ++i)
         if (!scene.covers(time_s[i])) points.status[i] = QUO_NOT_SEEN;
+}
+
+/** Of pixels, whose times are told too: then they take the places of lines and samples. */
+void pixels_to_ground(const Scene& scene, GeneralSAROrbit& own, Points& points) {
+    std::vector<std::int32_t> outside(points.count());
+    const PixelTimes times{points.out[9].data(), points.out[10].data(), outside.data()};
+    require_solved(scene.grid().pixelTimes({points.count(), points.in[0].data(), points.in[1].data()}, times));
+    std::ranges::copy(points.out[9], points.in[0].begin());
+    std::ranges::copy(points.out[10], points.in[1].begin());
+    to_ground(scene, own, points);
+    for (std::size_t i = 0; i < points.count(); ++i)
+        if (outside[i] != QUO_OK) points.status[i] = outside[i];
 }
 
 GeodeticPoint place_of(const Points& points, std::size_t i) {
@@ -132,6 +150,20 @@ void to_radar(const Scene& scene, GeneralSAROrbit& own, Points& points) {
     refuse_hidden(own, points);
 }
 
+/** Finds the pixels of the times that were found; a point whose times have none is not seen by the image. */
+void find_pixels(const Scene& scene, Points& points) {
+    std::vector<std::int32_t> outside(points.count());
+    const TimePixels pixels{points.out[2].data(), points.second_line.data(), points.out[3].data(), outside.data()};
+    require_solved(scene.grid().timePixels({points.count(), points.out[0].data(), points.out[1].data()}, pixels));
+    for (std::size_t i = 0; i < points.count(); ++i)
+        if (points.status[i] == QUO_OK && outside[i] != QUO_OK) points.status[i] = QUO_NOT_SEEN;
+}
+
+void to_pixels(const Scene& scene, GeneralSAROrbit& own, Points& points) {
+    to_radar(scene, own, points);
+    find_pixels(scene, points);
+}
+
 void to_radar_precisely(const Scene& /*scene*/, GeneralSAROrbit& own, Points& points) {
     find_positions(points);
     const auto& [x, y, z] = points.position_m;
@@ -142,24 +174,43 @@ void to_radar_precisely(const Scene& /*scene*/, GeneralSAROrbit& own, Points& po
     refuse_hidden(own, points);
 }
 
-constexpr Input kSample[] = {{"azimuth_time_s"}, {"range_time_s"}};
+void to_pixels_precisely(const Scene& scene, GeneralSAROrbit& own, Points& points) {
+    to_radar_precisely(scene, own, points);
+    find_pixels(scene, points);
+}
+
+constexpr const char* kAzimuthTime = "azimuth_time_s";
+constexpr Input kSample[] = {{.name = kAzimuthTime, .time = true}, {"range_time_s"}};
+constexpr Input kPixel[] = {{"line"}, {"sample"}};
 constexpr Input kPoint[] = {{"latitude_deg", -90.0, 90.0}, {"longitude_deg", -360.0, 360.0}, kHeight};
-constexpr const char* kGeometry[] = {"x_m",           "y_m",      "z_m",          "latitude_deg", "longitude_deg",
-                                     "incidence_deg", "look_deg", "fm_rate_hz_s", "speed_m_s"};
-constexpr const char* kTimes[] = {"azimuth_time_s", "range_time_s"};
+constexpr const char* kGeometry[] = {"x_m",           "y_m",           "z_m",         "latitude_deg",
+                                     "longitude_deg", "incidence_deg", "look_deg",    "fm_rate_hz_s",
+                                     "speed_m_s",     kAzimuthTime,    "range_time_s"};
+constexpr const char* kTimes[] = {kAzimuthTime, "range_time_s", "line", "sample"};
 
-constexpr Direction kToGround{kSample, kGeometry, to_ground};
-constexpr Direction kToRadar{kPoint, kTimes, to_radar};
-constexpr Direction kToRadarPrecisely{kPoint, kTimes, to_radar_precisely};
+constexpr Direction kToGround{kSample, std::span{kGeometry}.first(9), to_ground, true};
+constexpr Direction kPixelsToGround{kPixel, kGeometry, pixels_to_ground, true};
+constexpr Direction kToRadar{kPoint, std::span{kTimes}.first(2), to_radar};
+constexpr Direction kToRadarPrecisely{kPoint, std::span{kTimes}.first(2), to_radar_precisely};
+constexpr Direction kToPixels{kPoint, kTimes, to_pixels, false, 2};
+constexpr Direction kToPixelsPrecisely{kPoint, kTimes, to_pixels_precisely, false, 2};
 
-const Direction& direction_of(const GeolocateOptions& options) {
-    if (options.direction == "ground") {
-        if (options.precise) throw WrongUse("--precise belongs to --to radar");
-        if (options.height_m && !std::isfinite(*options.height_m))
-            throw WrongUse("a height of " + exact(*options.height_m) + " m");
-        return kToGround;
-    }
-    if (options.height_m) throw WrongUse("--height belongs to --to ground");
+void check_use(const GeolocateOptions& options) {
+    const bool ground = options.direction == "ground";
+    if (ground && options.precise) throw WrongUse("--precise belongs to --to radar");
+    if (ground && options.pixels)
+        throw WrongUse("--pixels belongs to --to radar; --to ground takes columns line and sample");
+    if (options.first && !options.pixels) throw WrongUse("--first belongs to --pixels");
+    if (ground && options.height_m && !std::isfinite(*options.height_m))
+        throw WrongUse("a height of " + exact(*options.height_m) + " m");
+    if (!ground && options.height_m) throw WrongUse("--height belongs to --to ground");
+}
+
+/** A table to the ground has times, or where it has none lines and samples. */
+const Direction& direction_of(const GeolocateOptions& options, const Table& table) {
+    if (options.direction == "ground")
+        return !table.find(kAzimuthTime) && table.find("line") ? kPixelsToGround : kToGround;
+    if (options.pixels) return options.precise ? kToPixelsPrecisely : kToPixels;
     return options.precise ? kToRadarPrecisely : kToRadar;
 }
 
@@ -169,7 +220,7 @@ public:
     Columns(const Table& table, const GeolocateOptions& options, const Direction& direction)
         : in_all_{table.columns().size()}, inputs_{direction.inputs}, doppler_{table.find(kDoppler.name)} {
         for (const Input& input : direction.inputs) indices_.push_back(table.need(input.name));
-        if (&direction == &kToGround) height_ = table.find(kHeight.name);
+        if (direction.ground) height_ = table.find(kHeight.name);
         if (height_ && options.height_m)
             throw Failure(table.input().name() + ": there is a column " + kHeight.name + ", and --height");
         given_height_m_ = options.height_m.value_or(0.0);
@@ -193,13 +244,14 @@ private:
     static std::optional<std::string> read_one(const Row& row, const Input& input, std::size_t index,
                                                double& value) {
         const std::string_view text = row.fields()[index];
-        const auto number = finite_number(text);
+        auto number = finite_number(text);
+        if (!number && input.time) number = date_of(text);
         if (number && *number >= input.lowest && *number <= input.highest) {
             value = *number;
             return std::nullopt;
         }
         const std::string what = std::string{input.name} + " is \"" + std::string{text} + "\"";
-        if (!number) return what + ", not a number";
+        if (!number) return what + (input.time ? ", neither a number nor a date" : ", not a number");
         return what + ", outside " + fixed(input.lowest, 0) + " to " + fixed(input.highest, 0);
     }
 
@@ -249,8 +301,10 @@ struct Solved {
 /** Solves rows and writes them, with room of its own for their values. */
 class RowSolver {
 public:
-    RowSolver(Scene& scene, const Columns& columns, const Direction& direction)
-        : scene_{&scene}, columns_{&columns}, direction_{&direction} {
+    RowSolver(Scene& scene, const Columns& columns, const Direction& direction, const GeolocateOptions& options)
+        : scene_{&scene}, columns_{&columns}, direction_{&direction}, first_only_{options.first} {
+        for (std::size_t k = 0; k < direction.outputs.size(); ++k)
+            if (options.iso && direction.outputs[k] == kAzimuthTime) iso_at_ = k;
         require_solved(scene.orbit().clone(loaded_.get()));
     }
 
@@ -293,14 +347,27 @@ private:
             const int status = cause ? QUO_REFUSED : points_.status[i];
             append_row(text, line, number, cause.has_value());
             if (!cause && status != 0) cause = "status " + status_text(status);
-            for (std::size_t k = 0; k < direction_->outputs.size(); ++k) {
-                text += ',';
-                if (status == 0) append_exact(text, points_.out[k][i]);
+            append_values(i, status);
+            if (status == 0 && !first_only_ && !std::isnan(points_.second_line[i])) {
+                append_row(text, line, number, false);
+                points_.out[direction_->line_at][i] = points_.second_line[i];
+                append_values(i, status);
             }
-            text.append(",").append(std::to_string(status)).append("\n");
             if (cause) solved_.complaints.push_back({number, std::move(*cause)});
             ++i;
         });
+    }
+    void append_values(std::size_t i, int status) {
+        std::string& text = solved_.text;
+        for (std::size_t k = 0; k < direction_->outputs.size(); ++k) {
+            text += ',';
+            if (status != 0) continue;
+            if (k == iso_at_)
+                text += iso_text(points_.out[k][i]);
+            else
+                append_exact(text, points_.out[k][i]);
+        }
+        text.append(",").append(std::to_string(status)).append("\n");
     }
     /** A row without a defect has as many fields as there are columns. */
     void append_row(std::string& text, std::string_view line, std::int64_t number, bool defect) {
@@ -315,6 +382,8 @@ private:
     const Scene* scene_;
     const Columns* columns_;
     const Direction* direction_;
+    bool first_only_;
+    std::size_t iso_at_ = kOutputs;  // the output that is written as a date
     std::unique_ptr<GeneralSAROrbit> loaded_ = std::make_unique<GeneralSAROrbit>(),
                                      own_ = std::make_unique<GeneralSAROrbit>();
     Points points_;
@@ -323,12 +392,14 @@ private:
     Solved solved_;
 };
 
-int geolocate_table(Scene& scene, const GeolocateOptions& options, const Direction& direction) {
+int geolocate_table(Scene& scene, const GeolocateOptions& options) {
     constexpr std::size_t kLinesAtOnce = 4096;
     Table table{options.input};
+    const Direction& direction = direction_of(options, table);
     const Columns columns{table, options, direction};
-    if (&direction == &kToGround) scene.require_look_side();
-    if (&direction == &kToGround || columns.has_doppler()) scene.require_wavelength();
+    if (direction.ground) scene.require_look_side();
+    if (direction.ground || columns.has_doppler()) scene.require_wavelength();
+    if (&direction == &kPixelsToGround || options.pixels) scene.take_grid();
 
     Output output{options.output};
     output.write(heading(table, direction));
@@ -348,7 +419,7 @@ int geolocate_table(Scene& scene, const GeolocateOptions& options, const Directi
         blocks::in_order(
             options.threads, [&] { return table.next_rows(kLinesAtOnce); },
             [&] {
-                return RowSolver{scene, columns, direction};
+                return RowSolver{scene, columns, direction, options};
             },
             hand_on);
     }
@@ -369,7 +440,7 @@ void warn_of_coarse_orbit(const Scene& scene, const GeneralSAROrbit& orbit) {
 }
 
 int geolocate(const GeolocateOptions& options) {
-    const Direction& direction = direction_of(options);
+    check_use(options);
     require_apart(header_files(options.header), {options.output});  // the table may be replaced by itself
     note_interrupts();
     Scene scene{options.header};
@@ -377,7 +448,7 @@ int geolocate(const GeolocateOptions& options) {
     if (!options.look.empty()) scene.use_look_sign(options.look == "left" ? -1 : 1);
     if (options.resample_s) scene.resample(*options.resample_s);
     warn_of_coarse_orbit(scene, scene.orbit());
-    return geolocate_table(scene, options, direction);
+    return geolocate_table(scene, options);
 }
 
 constexpr const char* kAbout = "Brings image samples to the ground, or ground points to image samples";
@@ -386,8 +457,11 @@ constexpr const char* kDetails =
     "through. A row without a solution gets a status other than 0 and empty values.\n"
     "  ground: reads azimuth_time_s, range_time_s and, if there, doppler_hz and height_m; adds x_m, y_m, z_m,\n"
     "          latitude_deg, longitude_deg, incidence_deg, look_deg, fm_rate_hz_s, speed_m_s, status\n"
+    "          or without times line and sample; then it adds azimuth_time_s and range_time_s too\n"
     "  radar:  reads latitude_deg, longitude_deg, height_m and, if there, doppler_hz; adds azimuth_time_s,\n"
-    "          range_time_s, status\n"
+    "          range_time_s, with --pixels line and sample, status\n"
+    "Lines and samples count from 0 at the centre of the first; a point that two bursts see gets a row for each.\n"
+    "Azimuth times may be dates: \"04-JAN-2022 17:05:58.5\" or \"2022-01-04T17:05:58.5\".\n"
     "Points of --to ground lie on the WGS84 ellipsoid, unless a column height_m or --height gives their heights.\n"
     "A computed column whose name is taken gets the prefix computed_.\n";
 
@@ -401,6 +475,9 @@ void add_geolocate(Command& program) {
     command.takes("--input", options.input, "Table to read, - for standard input", {.shows_default = true});
     command.takes("--output", options.output, "Table to write, - for standard output", {.shows_default = true});
     command.flag("--precise", options.precise, "First guess on the polynomial through the whole orbit");
+    command.flag("--pixels", options.pixels, "With --to radar: add line and sample");
+    command.flag("--first", options.first, "Of a point that two bursts see, the earlier burst's line only");
+    command.flag("--iso", options.iso, "Write azimuth times as ISO 8601 dates");
     command.takes("--wavelength", options.wavelength_m, "Wavelength in m, instead of the header's");
     command.takes("--look", options.look, "Look side, instead of the header's", {.one_of = {"right", "left"}});
     command.takes("--height", options.height_m, "Height of all ground points in m, instead of a column's");
