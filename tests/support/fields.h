@@ -3,12 +3,10 @@
 
 #include <gtest/gtest.h>
 
-#include <charconv>
 #include <cstddef>
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
-#include <iterator>
 #include <sstream>
 #include <string>
 #include <string_view>
@@ -18,17 +16,12 @@
 
 #include "quo_base/quorelxml_v2.h"
 #include "support/diagnostics.h"
+#include "support/escapes.h"
 
 /** Header objects seen from outside: what their documentation promises, field by field, and the means to fill,
  * compare, print and damage them without knowing their class. */
 namespace test {
 
-/** The shortest text that tells a number from any other of its type. */
-template <typename Number>
-std::string digits(Number value) {
-    char buffer[40];
-    return {buffer, std::to_chars(buffer, std::end(buffer), value).ptr};
-}
 inline std::string digits(char* text) { return text; }
 
 /** Calls `use` with each value of an element: a reference to a number, the place of a text. */
