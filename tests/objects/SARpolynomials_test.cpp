@@ -43,35 +43,6 @@ TEST(Poly, PlacesEveryTerm) {
     expect_terms<extended_polyDC>(kExtendedTerms);
 }
 
-// Polynomials full of nines are read by their older keys.
-TEST(PolyOld, MapsItsCoefficients) {
-    constexpr const char* kFile = QUO_TEST_DATA "/objects/older_polynomials.par";
-    const struct {
-        const char* section;
-        int rates;  // how many coefficients of a rate; 0 for a centroid
-        int status;
-        std::vector<double> pol;
-    } rows[] = {{"Five", 0, 0, {1, 2, 0, 0, 3, 4, 5}},        {"Seven", 0, 0, {1, 2, 3, 4, 5, 6, 7}},
-                {"Six", 0, 0, {9, 9, 9, 9, 9, 9, 9}},         {"Short", 0, 1, {9, 9, 9, 9, 9, 9, 9}},
-                {"None", 0, 1, {9, 9, 9, 9, 9, 9, 9}},        {"Rate", 5, 0, {1, 2, 0, 0, 3, 4, 5}},
-                {"Rate", 3, 0, {1, 2, 9, 3, 9, 9, 9}},  // the cross term
-                {"Rate", 7, 0, {11, 12, 13, 14, 15, 16, 17}}, {"Rate", 4, 1, {9, 9, 9, 9, 9, 9, 9}}};
-    for (const auto& row : rows) {
-        SCOPED_TRACE(testing::Message() << row.section << row.rates);
-        polyDC centroid;
-        polyFR rate;
-        poly& p = row.rates ? static_cast<poly&>(rate) : centroid;
-        std::ranges::fill(p.pol, 9.0);
-        EXPECT_EQ(
-            row.rates ? rate.readparold(kFile, row.section, row.rates) : centroid.readparold(kFile, row.section),
-            row.status);
-        EXPECT_THAT(p.pol, testing::ElementsAreArray(row.pol));
-        const bool has_reference = row.rates == 0 && row.section != std::string{"None"};
-        EXPECT_EQ(p.trg0, has_reference ? 0.25 : -999.0);
-        EXPECT_EQ(p.taz0, has_reference ? 9.5 : -999.0);
-    }
-}
-
 /** All that a set tells of one of its quantities. */
 struct Quantity {
     const char* name;

@@ -49,22 +49,6 @@ std::vector<double> members(const geopoint& p) {
     return {p.Latitude, p.Longitude, p.Height, p.IncidenceAngle, p.LookAngle};
 }
 
-// Kept as callers know it: the named members follow the array even where nothing, or not enough, was read.
-TEST(Geopoint, TakesItsArrayWhateverTheFileHas) {
-    const test::TemporaryFolder folder;
-    const std::string file = folder.file("points.par");
-    test::write_text(file, "[Coordinates]\nSouthEast = {44.21 8.03}\n");
-    for (const char* name : {"Center", "", "no/such point", static_cast<const char*>(nullptr), "SouthEast"}) {
-        geopoint point;
-        point.Latitude = 45.37;
-        EXPECT_EQ(point.readhdr(file.c_str(), name), 0);
-        const bool there = name && name == std::string_view{"SouthEast"};
-        EXPECT_THAT(members(point), ElementsAre(there ? 44.21 : -999.0, there ? 8.03 : -999.0, -999, -999, -999));
-    }
-    for (const char* name : {"", "North West", "<x>"})
-        EXPECT_EQ(geopoint{}.writehdr(file.c_str(), name), 1) << name;
-}
-
 // --- the corners of a region, as an orbit sees them -----------------------------------------------------------
 
 class GeoCoords : public testing::TestWithParam<test::Scene> {

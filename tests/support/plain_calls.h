@@ -4,6 +4,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <cstdio>
 #include <cstdlib>
 #include <filesystem>
 #include <functional>
@@ -144,6 +145,17 @@ template <typename Result, typename... Parameters>
 Call call_of(Result (*function)(Parameters...)) {
     return call_of(std::function<Result(Parameters...)>{function});
 }
+/** A call of a member of an object. */
+template <typename Object, typename Class, typename Result, typename... Parameters>
+Call call_of(Object& object, Result (Class::*member)(Parameters...)) {
+    return call_of(std::function<Result(Parameters...)>{
+        [&object, member](Parameters... parameters) { return (object.*member)(parameters...); }});
+}
+template <typename Object, typename Class, typename Result, typename... Parameters>
+Call call_of(const Object& object, Result (Class::*member)(Parameters...) const) {
+    return call_of(std::function<Result(Parameters...)>{
+        [&object, member](Parameters... parameters) { return (object.*member)(parameters...); }});
+}
 /** Calls by the names that a list has, separated by commas. */
 template <typename... Functions>
 Calls calls_of(const std::string& list, Functions... functions) {
@@ -193,11 +205,17 @@ inline void PlainSession::run(const char* script, Calls calls) {
     calls["show"] = [](auto& words, auto& told) { return told = shown(read_text(words.text(1))), 0; };
     calls["length"] = [](auto& words, auto&) { return static_cast<std::int64_t>(fs::file_size(words.text(1))); };
     calls["resize"] = [](auto& words, auto&) { return truncate(words.text(1), words.number(2)); };
+    calls["remove"] = [](auto& words, auto&) { return std::remove(words.text(1)); };
     calls["link"] = [](auto& words, auto&) { return symlink(words.text(2), words.text(1)); };
     calls["leads"] = [](auto& words, auto& told) { return told = shown(fs::read_symlink(words.text(1))), 0; };
     calls["report"] = [this](auto&, auto& told) { return tell_entries(told); };
-    for (const auto& [name, call] : Calls{calls})
+    for (const auto& [name, call] : Calls{calls}) {
         calls["ends:" + name] = [call](auto& words, auto& told) { return ended(call, words, told); };
+        calls["starves:" + name] = [this, call](auto& words, auto& told) {
+            fail_every_allocation([&] { return told.clear(), static_cast<int>(call(words, told)); });
+            return told_ = report_.entries().size(), 0;
+        };
+    }
     run_session(script, GetParam(), [&](const Words& words, std::string& told) {
         const std::int64_t result = calls.at(words.text(0))(words, told);
         EXPECT_EQ(errno, 0) << words.text(0);

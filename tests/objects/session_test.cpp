@@ -1,0 +1,175 @@
+// Runs the sessions of data/objects/sessions.txt.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <string>
+
+#include "objects/records.h"
+#include "quo_base/profile.h"
+#include "support/plain_calls.h"
+
+namespace {
+
+constexpr char kScript[] = QUO_TEST_DATA "/objects/sessions.txt";
+using Info = DataSetInfo_Obj;
+
+class Session : public test::PlainSession {
+protected:
+    Session() { FreeProfile(nullptr); }
+    /** An object by the name that the script has for it; none by "(null)". */
+    template <typename Class>
+    [[nodiscard]] Class* object(const char* name) {
+        return name ? dynamic_cast<Class*>(objects_.at(name)) : nullptr;
+    }
+    /** Tells a field, which may be of a part of the object or beside the table, or all of them. */
+    std::int64_t get(const test::Words& words, std::string& told) {
+        for (const auto& [name, values] : test::contents(*objects_.at(words.text(1)))) {
+            if (words.text(2, name.c_str()) != name) continue;
+            told += name;
+            for (const std::string& value : values) told += " " + value;
+            told += "\n";
+        }
+        return 0;
+    }
+    /** Gives a field the values behind its name; a text is one of them. */
+    std::int64_t set(const test::Words& words) {
+        const std::string wanted = words.text(2);
+        std::size_t word = 2;
+        for (const auto& [name, part] : test::parts_of(*objects_.at(words.text(1))))
+            for (int i = 0; i < part->elementCount(); ++i)
+                if (name + part->element(i)->name == wanted)
+                    test::for_each_value(*part->element(i), [&]<typename T>(T& value) {
+                        if constexpr (std::is_pointer_v<T>)
+                            std::strncpy(value, words.text(++word), 511);
+                        else
+                            value = test::parsed<T>(words.text(++word));
+                    });
+        return word > 2 ? 0 : -1;
+    }
+    /** The values of an enumeration that a question holds for, and some that are none. */
+    template <typename Enumeration>
+    test::Call which(bool (Info::*question)(Enumeration) const) {
+        return [this, question](auto&, auto& told) {
+            for (int value = -1; value < 17; ++value)
+                told += (info_.*question)(static_cast<Enumeration>(value)) ? std::to_string(value) + "\n" : "";
+            return 0;
+        };
+    }
+
+    ROI_Obj a_, b_, out_;
+    FileROI_Obj file_;
+    ROI_Coords coords_;
+    Info info_;
+    SwathInfo swath_, copy_;
+    AntennaPattern_Obj pattern_, target_;
+    polyDC dc_;
+    polyFR fr_;
+    geopoint point_;
+    geoCoords_Obj grid_;
+    const std::map<std::string, GeneralSAR_BaseXML*> objects_ = {
+        {"a", &a_},       {"b", &b_},         {"out", &out_},     {"file", &file_},       {"coords", &coords_},
+        {"info", &info_}, {"swath", &swath_}, {"copy", &copy_},   {"pattern", &pattern_}, {"target", &target_},
+        {"dc", &dc_},     {"fr", &fr_},       {"point", &point_}, {"grid", &grid_}};
+};
+
+TEST_P(Session, AnswersAndWritesWhatTheScriptSays) {
+    const auto header = [this](auto& words) { return object<GeneralSAR_Base>(words.text(1)); };
+    run(kScript,
+        {{"get", [&](auto& words, auto& told) { return get(words, told); }},
+         {"set", [&](auto& words, auto&) { return set(words); }},
+         {"readhdr", [&](auto& words, auto&) { return header(words)->readhdr(words.text(2)); }},
+         {"writehdr", [&](auto& words, auto&) { return header(words)->writehdr(words.text(2)); }},
+         {"golden",
+          [](auto& words, auto&) {  // a file of the test data, behind what is there
+              return test::write_text(words.text(1),
+                                      test::read_text(words.text(1)) +
+                                          test::read_text(std::string{QUO_TEST_DATA "/objects/"} + words.text(2))),
+                     0;
+          }},
+         {"replace",
+          [](auto& words, auto&) {
+              std::string text = test::read_text(words.text(1));
+              const std::string from = words.text(2);
+              return test::write_text(words.text(1), text.replace(text.find(from), from.size(), words.text(3))), 0;
+          }},
+         {"SetFastAxe", test::call_of(a_, &ROI_Obj::SetFastAxe)},
+         {"SetSlowAxe", test::call_of(a_, &ROI_Obj::SetSlowAxe)},
+         {"ResetROI", test::call_of(a_, &ROI_Obj::ResetROI)},
+         {"isNULL", [&](auto& words, auto&) { return object<ROI_Obj>(words.text(1))->isNULL(); }},
+         {"GetFastIndex", test::call_of(a_, &ROI_Obj::GetFastIndex)},
+         {"GetSlowIndex", test::call_of(a_, &ROI_Obj::GetSlowIndex)},
+         {"GetFastRange", test::call_of(a_, &ROI_Obj::GetFastRange)},
+         {"GetSlowRange", test::call_of(a_, &ROI_Obj::GetSlowRange)},
+         {"corners",
+          [this](auto&, auto& told) {
+              for (const ROI_Time& corner :
+                   {a_.GetUpLeft(), a_.GetUpRight(), a_.GetDownLeft(), a_.GetDownRight(), a_.GetCenter()})
+                  told += test::digits(corner.FastTime) + " " + test::digits(corner.SlowTime) + "\n";
+              return 0;
+          }},
+         {"IntersectROI",
+          [this](auto& words, auto&) {
+              return ROI_Obj::IntersectROI(object<ROI_Obj>(words.text(1)), object<ROI_Obj>(words.text(2)),
+                                           object<ROI_Obj>(words.text(3)));
+          }},
+         {"GetROI",
+          [this](auto& words, auto&) {
+              return coords_.GetROI(object<ROI_Obj>(words.text(1)), object<ROI_Obj>(words.text(2)));
+          }},
+         {"write_roi", test::call_of(a_, &ROI_Obj::write_roi)},
+         {"SetFile", test::call_of(file_, &FileROI_Obj::SetFile)},
+         {"read_roi", [this](auto&, auto&) { return file_.read_roi(); }},
+         {"file",
+          [this](auto&, auto& told) {
+              return told = file_.FileName + std::string{" "} + file_.SectionName + "\n", 0;
+          }},
+         {"SetImageType", test::call_of(info_, &Info::SetImageType)},
+         {"IsImageType", which(&Info::IsImageType)},
+         {"SetSensorType", test::call_of(info_, &Info::SetSensorType)},
+         {"IsSensorType", which(&Info::IsSensorType)},
+         {"SetAcqMode", test::call_of(info_, &Info::SetAcqMode)},
+         {"IsAcqMode", which(&Info::IsAcqMode)},
+         {"SetProjection", test::call_of(info_, &Info::SetProjection)},
+         {"IsProjection", which(&Info::IsProjection)},
+         {"SetUnitType", test::call_of(info_, &Info::SetUnitType)},
+         {"IsUnitType", which(&Info::IsUnitType)},
+         {"SetRefSys", test::call_of(info_, &Info::SetRefSys)},
+         {"IsRefSys", which(&Info::IsRefSys)},
+         {"SetType", test::call_of(info_, &Info::SetType)},
+         {"IsType", test::call_of(info_, &Info::IsType)},
+         {"fillQUOREL", test::call_of(info_, &Info::fillQUOREL)},
+         {"getPolarizationNbr", test::call_of(info_, &Info::getPolarizationNbr)},
+         {"getISNbr", test::call_of(info_, &Info::getISNbr)},
+         {"readBurstTimes", test::call_of(swath_, &SwathInfo::readBurstTimes)},
+         {"times",
+          [this](auto& words, auto&) {
+              return swath_.BurstStartTimes = test::Argument<const double*>{words.text(1)}.values, 0;
+          }},
+         {"clone", [this](auto&, auto&) { return swath_.clone(&copy_); }},
+         {"samples",
+          [this](auto& words, auto&) {
+              pattern_.Pattern = test::Argument<const float*>{words.text(1)}.values;
+              return pattern_.PatternFile.setFilename("pattern"), 0;
+          }},
+         {"getPatternArray",
+          [this](auto& words, auto& told) {
+              test::Argument<float*> room{words.text(2)};
+              const int status = object<AntennaPattern_Obj>(words.text(1))->getPatternArray(room.get());
+              return room.tell(told), status;
+          }},
+         {"WritePatternArray",
+          [this](auto& words, auto&) { return object<AntennaPattern_Obj>(words.text(1))->WritePatternArray(); }},
+         {"createBuffers",
+          [this](auto& words, auto&) { return object<AntennaPattern_Obj>(words.text(1))->createBuffers(); }},
+         {"writeboth",
+          [this](auto& words, auto&) { return object<AntennaPattern_Obj>(words.text(1))->writehdr(); }},
+         {"dc.readparold", test::call_of(dc_, &polyDC::readparold)},
+         {"fr.readparold", test::call_of(fr_, &polyFR::readparold)},
+         {"point.readhdr", [this](auto& words, auto&) { return point_.readhdr(words.text(1), words.text(2)); }},
+         {"point.writehdr",
+          [this](auto& words, auto&) { return point_.writehdr(words.text(1), words.text(2)); }}});
+}
+INSTANTIATE_TEST_SUITE_P(Script, Session, testing::ValuesIn(test::sessions_of(kScript)),
+                         [](const auto& row) { return row.param; });
+
+}  // namespace
