@@ -1,12 +1,5 @@
 #include "quo_base/datafile.h"
 
-#include <gtest/gtest.h>
-#include <sys/stat.h>
-
-#include <filesystem>
-#include <string>
-#include <vector>
-
 #include "support/diagnostics.h"
 #include "support/fields.h"
 

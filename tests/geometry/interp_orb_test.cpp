@@ -1,12 +1,5 @@
 #include "quo_base/interp_orb.h"
 
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <cmath>
-#include <limits>
-#include <vector>
-
 #include "orbit_fit.h"
 #include "support/diagnostics.h"
 #include "support/geometry.h"

@@ -1,15 +1,3 @@
-#include <gtest/gtest.h>
-#include <sys/stat.h>
-#include <unistd.h>
-
-#include <cerrno>
-#include <cstdint>
-#include <cstdio>
-#include <filesystem>
-#include <fstream>
-#include <string>
-#include <utility>
-
 #include "quo_base/gen_utils.h"
 #include "sarutillib/ground/file_io.h"
 #include "support/diagnostics.h"

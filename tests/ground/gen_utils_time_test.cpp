@@ -1,14 +1,4 @@
-#include <gtest/gtest.h>
-
-#include <array>
 #include <chrono>
-#include <cmath>
-#include <cstdio>
-#include <limits>
-#include <random>
-#include <sstream>
-#include <string>
-#include <utility>
 
 #include "quo_base/gen_utils.h"
 #include "sarutillib/ground/gen_utils_dates.h"

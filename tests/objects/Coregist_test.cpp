@@ -1,12 +1,5 @@
 #include "quo_base/Coregist.h"
 
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <cmath>
-#include <string>
-#include <vector>
-
 #include "support/diagnostics.h"
 
 namespace {

@@ -1,14 +1,5 @@
 #include "quo_base/SARpolynomials.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <cmath>
-#include <memory>
-#include <string>
-#include <vector>
-
 #include "support/diagnostics.h"
 
 namespace {

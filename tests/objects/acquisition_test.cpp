@@ -1,15 +1,5 @@
 #include "quo_base/acquisition.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <cmath>
-#include <complex>
-#include <filesystem>
-#include <numbers>
-#include <string>
-#include <vector>
-
 #include "quo_base/datafile.h"
 #include "support/diagnostics.h"
 #include "support/fields.h"

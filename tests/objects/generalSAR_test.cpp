@@ -1,14 +1,5 @@
 #include "quo_base/generalSAR.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <cerrno>
-#include <filesystem>
-#include <string>
-#include <vector>
-
 #include "objects/records.h"
 #include "quo_base/profile.h"
 #include "support/diagnostics.h"

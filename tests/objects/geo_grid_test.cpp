@@ -1,12 +1,5 @@
 #include "quo_base/geo_grid.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <filesystem>
-#include <string>
-#include <vector>
-
 #include "objects/records.h"
 #include "support/diagnostics.h"
 #include "support/scenes.h"

@@ -1,8 +1,4 @@
 // Runs the sessions of data/objects/sessions.txt.
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <string>
 
 #include "objects/records.h"
 #include "quo_base/profile.h"

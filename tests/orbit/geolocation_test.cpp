@@ -1,14 +1,3 @@
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <cmath>
-#include <limits>
-#include <numeric>
-#include <random>
-#include <string_view>
-#include <utility>
-#include <vector>
-
 #include "orbit/made_orbits.h"
 #include "support/diagnostics.h"
 #include "support/geometry.h"

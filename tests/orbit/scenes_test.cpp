@@ -1,10 +1,5 @@
 #include "support/scenes.h"
 
-#include <gtest/gtest.h>
-
-#include <cmath>
-#include <vector>
-
 #include "orbit/made_orbits.h"
 #include "support/geometry.h"
 

@@ -1,16 +1,3 @@
-#include <gtest/gtest.h>
-
-#include <array>
-#include <bit>
-#include <cerrno>
-#include <cstdint>
-#include <cstdio>
-#include <cstdlib>
-#include <optional>
-#include <random>
-#include <string>
-#include <string_view>
-
 #include "profile_property.h"
 #include "quo_base/profile.h"
 #include "support/diagnostics.h"

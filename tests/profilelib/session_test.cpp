@@ -1,5 +1,4 @@
 // Runs the sessions of data/profile/sessions.txt.
-#include <gtest/gtest.h>
 
 #include "quo_base/profile.h"
 #include "support/plain_calls.h"

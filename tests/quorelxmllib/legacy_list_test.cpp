@@ -1,14 +1,6 @@
 #include "quorelxmllib/legacy_list.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
 #include <locale.h>
-
-#include <cmath>
-#include <cstdlib>
-#include <numbers>
-#include <string>
-#include <vector>
 
 #include "support/diagnostics.h"
 #include "support/escapes.h"

@@ -1,18 +1,7 @@
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
 #include <libxml/parser.h>
 #include <libxml/xpath.h>
 
-#include <algorithm>
-#include <cstring>
-#include <memory>
-#include <random>
 #include <regex>
-#include <set>
-#include <string>
-#include <string_view>
-#include <utility>
-#include <vector>
 
 #include "header_files.h"
 #include "support/fields.h"

@@ -1,13 +1,3 @@
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <array>
-#include <cmath>
-#include <cstring>
-#include <limits>
-#include <string>
-#include <vector>
-
 #include "header_files.h"
 #include "quo_base/quorelxml_v2.h"
 

@@ -1,8 +1,6 @@
 #include "quorelxmllib/xml_text.h"
 
-#include <gtest/gtest.h>
-
-#include <string>
+#include "support/prelude.h"
 
 namespace {
 

@@ -1,10 +1,7 @@
 #ifndef QUO_TESTS_SUPPORT_ESCAPES_H
 #define QUO_TESTS_SUPPORT_ESCAPES_H
 
-#include <charconv>
-#include <iterator>
-#include <string>
-#include <string_view>
+#include "support/prelude.h"
 
 namespace test {
 

@@ -1,19 +1,6 @@
 #ifndef QUO_TESTS_SUPPORT_FIELDS_H
 #define QUO_TESTS_SUPPORT_FIELDS_H
 
-#include <gtest/gtest.h>
-
-#include <cstddef>
-#include <cstdint>
-#include <cstdio>
-#include <cstring>
-#include <sstream>
-#include <string>
-#include <string_view>
-#include <type_traits>
-#include <utility>
-#include <vector>
-
 #include "quo_base/quorelxml_v2.h"
 #include "support/diagnostics.h"
 #include "support/escapes.h"

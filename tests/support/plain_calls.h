@@ -1,17 +1,6 @@
 #ifndef QUO_TESTS_SUPPORT_PLAIN_CALLS_H
 #define QUO_TESTS_SUPPORT_PLAIN_CALLS_H
 
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <cstdio>
-#include <cstdlib>
-#include <filesystem>
-#include <functional>
-#include <map>
-#include <tuple>
-#include <type_traits>
-
 #include "support/escapes.h"
 #include "support/session.h"
 

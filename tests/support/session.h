@@ -1,14 +1,7 @@
 #ifndef QUO_TESTS_SUPPORT_SESSION_H
 #define QUO_TESTS_SUPPORT_SESSION_H
 
-#include <gtest/gtest.h>
-
-#include <cstdint>
 #include <iomanip>
-#include <sstream>
-#include <string>
-#include <utility>
-#include <vector>
 
 #include "support/diagnostics.h"
 
