@@ -95,27 +95,6 @@ TEST_F(QuorelxmlLayout, FindsWhatTheDocumentedExpressionFinds) {
         EXPECT_EQ(document.countNodes(1, name), 0) << name;
 }
 
-TEST_F(QuorelxmlLayout, CountsTheChannelsItAdds) {
-    for (const char* count : {"1", "2147483647", "-2147483648", "many", ""}) {
-        OpenDocument& document = load(test::replaced(header_text(""), ">1<", ">" + std::string{count} + "<"));
-        EXPECT_EQ(document.createChannel(1) + document.createChannel(-2) + document.createField(7, "a"), 0);
-        EXPECT_TRUE(document.channelExists(7) && (*count != '1' || document.numberOfChannels() == 3));
-        EXPECT_NE(saved().find("  </Channel>\n  <Channel Number=\"-2\"/>\n  <Channel Number=\"7\">\n    <a/>\n"),
-                  std::string::npos);
-        EXPECT_EQ(read_text(file_).find(">3</NumberOfChannels>") != std::string::npos, *count == '1');
-    }
-}
-
-TEST_F(QuorelxmlLayout, MakesADocumentForTheFirstField) {
-    const std::int32_t value = 5;
-    EXPECT_EQ(document_.writeInt(1, "a", &value, 1), 0) << "nothing had been loaded";
-    EXPECT_EQ(load("<Other><a/></Other>").writeInt(1, "a", &value, 1), 0);
-    EXPECT_NE(saved().find("<Channel Number=\"1\">\n    <a>5</a>"), std::string::npos);
-    EXPECT_EQ(document_.setFormat(3, 0), 0);
-    EXPECT_EQ(document_.format(), "%.15g, %.15g, %.15g");
-    EXPECT_EQ(document_.setFormat(2, 9), 1);
-}
-
 /** Text inside the channel without line breaks and indentation. */
 std::string inside(const std::string& text) {
     const auto start = text.find("<Channel Number=\"1\">") + 20;

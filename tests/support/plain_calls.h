@@ -98,13 +98,11 @@ struct Argument<const char* const*> : Argument<char* const*> {
 
 /** Gives a whole number, and tells any other result. */
 template <typename Result>
-std::int64_t given(Result result, std::string& told) {
-    if constexpr (std::is_integral_v<Result> || std::is_enum_v<Result>)
-        return static_cast<std::int64_t>(result);
-    else if constexpr (std::is_floating_point_v<Result>)
-        told += digits(result) + "\n";
-    else
-        told += shown(result ? result : "(null)");
+std::int64_t given(const Result& result, std::string& told) {
+    if constexpr (std::is_integral_v<Result> || std::is_enum_v<Result>) return static_cast<std::int64_t>(result);
+    if constexpr (std::is_floating_point_v<Result>) told += digits(result) + "\n";
+    if constexpr (std::is_pointer_v<Result>) told += shown(result ? result : "(null)");
+    if constexpr (std::is_class_v<Result>) told += shown(result);
     return 0;
 }
 
@@ -138,12 +136,12 @@ Call call_of(Result (*function)(Parameters...)) {
 template <typename Object, typename Class, typename Result, typename... Parameters>
 Call call_of(Object& object, Result (Class::*member)(Parameters...)) {
     return call_of(std::function<Result(Parameters...)>{
-        [&object, member](Parameters... parameters) { return (object.*member)(parameters...); }});
+        [&object, member](Parameters... parameters) -> Result { return (object.*member)(parameters...); }});
 }
 template <typename Object, typename Class, typename Result, typename... Parameters>
 Call call_of(const Object& object, Result (Class::*member)(Parameters...) const) {
     return call_of(std::function<Result(Parameters...)>{
-        [&object, member](Parameters... parameters) { return (object.*member)(parameters...); }});
+        [&object, member](Parameters... parameters) -> Result { return (object.*member)(parameters...); }});
 }
 /** Calls by the names that a list has, separated by commas. */
 template <typename... Functions>

@@ -14,7 +14,10 @@
 #include <array>
 #include <bit>
 #include <cerrno>
+#include <charconv>
 #include <cmath>
+#include <complex>
+#include <csignal>
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
@@ -23,11 +26,16 @@
 #include <functional>
 #include <limits>
 #include <map>
+#include <memory>
 #include <numbers>
 #include <numeric>
 #include <optional>
 #include <random>
+#include <set>
 #include <sstream>
+#include <string>
 #include <tuple>
+#include <typeinfo>
+#include <vector>
 
 #endif
