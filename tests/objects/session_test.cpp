@@ -9,6 +9,9 @@ namespace {
 constexpr char kScript[] = QUO_TEST_DATA "/objects/sessions.txt";
 using Info = DataSetInfo_Obj;
 
+using ByStatus = int (polySAR::*)(double, double, double*) const;
+using ByValue = double (polySAR::*)(double, double) const;
+
 class Session : public test::PlainSession {
 protected:
     Session() { FreeProfile(nullptr); }
@@ -52,6 +55,21 @@ protected:
         };
     }
 
+    /** All that a set of polynomials tells of its quantities. */
+    test::Calls of_quantities() {
+#define QUO_QUANTITY(KIND)                                                                                     \
+    {"Evaluate" #KIND, test::call_of(set_, static_cast<ByStatus>(&polySAR::Evaluate##KIND))},                  \
+        {"Evaluate" #KIND "interp",                                                                            \
+         test::call_of(set_, static_cast<ByStatus>(&polySAR::Evaluate##KIND##interp))},                        \
+        {"value" #KIND, test::call_of(set_, static_cast<ByValue>(&polySAR::Evaluate##KIND))},                  \
+        {"value" #KIND "interp", test::call_of(set_, static_cast<ByValue>(&polySAR::Evaluate##KIND##interp))}, \
+        {"get" #KIND "poly", test::call_of(set_, &polySAR::get##KIND##poly)}, {                                \
+        "get" #KIND "num", test::call_of(set_, &polySAR::get##KIND##num)                                       \
+    }
+        return {QUO_QUANTITY(DC),    QUO_QUANTITY(FR),       QUO_QUANTITY(SL2GR),
+                QUO_QUANTITY(GR2SL), QUO_QUANTITY(SL2THETA), QUO_QUANTITY(SL2PHI)};
+    }
+
     ROI_Obj a_, b_, out_;
     FileROI_Obj file_;
     ROI_Coords coords_;
@@ -60,17 +78,21 @@ protected:
     AntennaPattern_Obj pattern_, target_;
     polyDC dc_;
     polyFR fr_;
+    polySAR set_;
+    SARPulse_Obj pulse_;
     geopoint point_;
     geoCoords_Obj grid_;
     const std::map<std::string, GeneralSAR_BaseXML*> objects_ = {
-        {"a", &a_},       {"b", &b_},         {"out", &out_},     {"file", &file_},       {"coords", &coords_},
-        {"info", &info_}, {"swath", &swath_}, {"copy", &copy_},   {"pattern", &pattern_}, {"target", &target_},
-        {"dc", &dc_},     {"fr", &fr_},       {"point", &point_}, {"grid", &grid_}};
+        {"a", &a_},        {"b", &b_},         {"out", &out_},     {"file", &file_},       {"coords", &coords_},
+        {"info", &info_},  {"swath", &swath_}, {"copy", &copy_},   {"pattern", &pattern_}, {"target", &target_},
+        {"dc", &dc_},      {"fr", &fr_},       {"point", &point_}, {"grid", &grid_},       {"set", &set_},
+        {"pulse", &pulse_}};
 };
 
 TEST_P(Session, AnswersAndWritesWhatTheScriptSays) {
     const auto header = [this](auto& words) { return object<GeneralSAR_Base>(words.text(1)); };
-    run(kScript,
+    test::Calls calls = of_quantities();
+    calls.merge(test::Calls
         {{"get", [&](auto& words, auto& told) { return get(words, told); }},
          {"set", [&](auto& words, auto&) { return set(words); }},
          {"readhdr", [&](auto& words, auto&) { return header(words)->readhdr(words.text(2)); }},
@@ -163,7 +185,14 @@ TEST_P(Session, AnswersAndWritesWhatTheScriptSays) {
          {"fr.readparold", test::call_of(fr_, &polyFR::readparold)},
          {"point.readhdr", [this](auto& words, auto&) { return point_.readhdr(words.text(1), words.text(2)); }},
          {"point.writehdr",
-          [this](auto& words, auto&) { return point_.writehdr(words.text(1), words.text(2)); }}});
+          [this](auto& words, auto&) { return point_.writehdr(words.text(1), words.text(2)); }},
+         {"CreatePolys", test::call_of(set_, static_cast<int (polySAR::*)(int, int, int, int, int, int)>(&polySAR::CreatePolys))},
+         {"chirpSamples", test::call_of(pulse_, &SARPulse_Obj::chirpSamples)},
+         {"generateChirp", [this](auto& words, auto& told) {
+             test::Argument<float*> room{words.text(1)};
+             const int status = pulse_.generateChirp(reinterpret_cast<fcomplex*>(room.get()));
+             return room.tell(told), status; }}});
+    run(kScript, calls);
 }
 INSTANTIATE_TEST_SUITE_P(Script, Session, testing::ValuesIn(test::sessions_of(kScript)),
                          [](const auto& row) { return row.param; });

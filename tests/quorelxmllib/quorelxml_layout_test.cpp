@@ -1,14 +1,11 @@
 #include <libxml/parser.h>
 #include <libxml/xpath.h>
 
-#include <regex>
-
 #include "header_files.h"
 #include "support/fields.h"
 
 namespace {
 
-using test::header_text;
 using test::OpenDocument;
 using test::read_text;
 using test::write_text;
@@ -32,10 +29,6 @@ protected:
         write_text(file_, text);
         document_.initXmlFile(file_.c_str());
         return document_;
-    }
-    std::string saved() {
-        EXPECT_EQ(document_.write(), 0);
-        return read_text(file_);
     }
     test::TemporaryFolder folder_;
     const std::string file_ = folder_.file("header.xml");
@@ -93,25 +86,6 @@ TEST_F(QuorelxmlLayout, FindsWhatTheDocumentedExpressionFinds) {
     for (const char* name : {"..", "*", "../Description", "Sec[1]", "Sec/*", "@Number", "Sec//a", "//a", "/Sec/a",
                              "Sec/a/", "Sec/a/text()", "Sec|Other", "x:Sec", "\"]|//*[\"", ".", "Sec/./a"})
         EXPECT_EQ(document.countNodes(1, name), 0) << name;
-}
-
-/** Text inside the channel without line breaks and indentation. */
-std::string inside(const std::string& text) {
-    const auto start = text.find("<Channel Number=\"1\">") + 20;
-    return std::regex_replace(text.substr(start, text.find("</Channel>") - start), std::regex{"\n *"}, "");
-}
-
-// A field is created so often that there are as many of it as the row says, or goes where that is 0.
-TEST_F(QuorelxmlLayout, CreatesWhatIsMissingWhereItBelongsAndRemovesAWholeField) {
-    for (const auto& row : test::read_table("headers/changes.txt", '|')) {
-        SCOPED_TRACE(row[3]);
-        const char* const field = row[1].c_str();
-        const int count = std::stoi(row[2]);
-        EXPECT_EQ(load(header_text(row[0])).clearField(2, field), 0);
-        EXPECT_EQ(count ? document_.createField(1, field, count) : document_.clearField(1, field), 0);
-        EXPECT_EQ(inside(saved()), row[3]);
-        EXPECT_TRUE(document_.fieldHasCount(1, field, count));
-    }
 }
 
 // The children of one element, as the document has them and as a list of names and numbers in the order of the

@@ -1,5 +1,7 @@
 // Runs the sessions of data/headers/sessions.txt.
 #include "header_files.h"
+#include "quorelxmllib/legacy_list.h"
+#include "quorelxmllib/xml_text.h"
 #include "support/plain_calls.h"
 
 namespace {
@@ -8,6 +10,17 @@ constexpr char kScript[] = QUO_TEST_DATA "/headers/sessions.txt";
 
 /** A header with this inside its channel. */
 void header(const char* inside) { test::write_text("header.xml", test::header_text(inside)); }
+
+/** A text as XML holds it; "(none)" where it cannot. */
+std::string stored(const char* text) { return quo::xml_text(text).value_or("(none)"); }
+int fits(const char* text) { return quo::xml_text(text) ? 1 : 0; }
+int is_field_path(const char* path) { return quo::is_field_path(path) ? 1 : 0; }
+template <typename Number>
+int scan(const char* list, Number* values, int count) {
+    const int found = quo::scan_list(list, values, count);
+    errno = 0;  // which tells of numbers beyond the type, as strtod's does
+    return found;
+}
 
 class Session : public test::PlainSession {
 protected:
@@ -31,6 +44,12 @@ TEST_P(Session, AnswersAndWritesWhatTheScriptSays) {
         return found ? 1 : 0;
     };
     run(kScript, {{"header", test::call_of(header)},
+                  {"stored", test::call_of(stored)},
+                  {"fits", test::call_of(fits)},
+                  {"is_field_path", test::call_of(is_field_path)},
+                  {"scan_doubles", test::call_of(scan<double>)},
+                  {"scan_floats", test::call_of(scan<float>)},
+                  {"scan_ints", test::call_of(scan<std::int32_t>)},
                   {"getNode", node},
                   {"createField",
                    [this](auto& words, auto&) {
