@@ -92,106 +92,94 @@ protected:
 TEST_P(Session, AnswersAndWritesWhatTheScriptSays) {
     const auto header = [this](auto& words) { return object<GeneralSAR_Base>(words.text(1)); };
     test::Calls calls = of_quantities();
-    calls.merge(test::Calls
-        {{"get", [&](auto& words, auto& told) { return get(words, told); }},
-         {"set", [&](auto& words, auto&) { return set(words); }},
-         {"readhdr", [&](auto& words, auto&) { return header(words)->readhdr(words.text(2)); }},
-         {"writehdr", [&](auto& words, auto&) { return header(words)->writehdr(words.text(2)); }},
-         {"golden",
-          [](auto& words, auto&) {  // a file of the test data, behind what is there
-              return test::write_text(words.text(1),
-                                      test::read_text(words.text(1)) +
-                                          test::read_text(std::string{QUO_TEST_DATA "/objects/"} + words.text(2))),
-                     0;
-          }},
-         {"replace",
-          [](auto& words, auto&) {
-              std::string text = test::read_text(words.text(1));
-              const std::string from = words.text(2);
-              return test::write_text(words.text(1), text.replace(text.find(from), from.size(), words.text(3))), 0;
-          }},
-         {"SetFastAxe", test::call_of(a_, &ROI_Obj::SetFastAxe)},
-         {"SetSlowAxe", test::call_of(a_, &ROI_Obj::SetSlowAxe)},
-         {"ResetROI", test::call_of(a_, &ROI_Obj::ResetROI)},
-         {"isNULL", [&](auto& words, auto&) { return object<ROI_Obj>(words.text(1))->isNULL(); }},
-         {"GetFastIndex", test::call_of(a_, &ROI_Obj::GetFastIndex)},
-         {"GetSlowIndex", test::call_of(a_, &ROI_Obj::GetSlowIndex)},
-         {"GetFastRange", test::call_of(a_, &ROI_Obj::GetFastRange)},
-         {"GetSlowRange", test::call_of(a_, &ROI_Obj::GetSlowRange)},
-         {"corners",
-          [this](auto&, auto& told) {
-              for (const ROI_Time& corner :
-                   {a_.GetUpLeft(), a_.GetUpRight(), a_.GetDownLeft(), a_.GetDownRight(), a_.GetCenter()})
-                  told += test::digits(corner.FastTime) + " " + test::digits(corner.SlowTime) + "\n";
-              return 0;
-          }},
-         {"IntersectROI",
-          [this](auto& words, auto&) {
-              return ROI_Obj::IntersectROI(object<ROI_Obj>(words.text(1)), object<ROI_Obj>(words.text(2)),
-                                           object<ROI_Obj>(words.text(3)));
-          }},
-         {"GetROI",
-          [this](auto& words, auto&) {
-              return coords_.GetROI(object<ROI_Obj>(words.text(1)), object<ROI_Obj>(words.text(2)));
-          }},
-         {"write_roi", test::call_of(a_, &ROI_Obj::write_roi)},
-         {"SetFile", test::call_of(file_, &FileROI_Obj::SetFile)},
-         {"read_roi", [this](auto&, auto&) { return file_.read_roi(); }},
-         {"file",
-          [this](auto&, auto& told) {
-              return told = file_.FileName + std::string{" "} + file_.SectionName + "\n", 0;
-          }},
-         {"SetImageType", test::call_of(info_, &Info::SetImageType)},
-         {"IsImageType", which(&Info::IsImageType)},
-         {"SetSensorType", test::call_of(info_, &Info::SetSensorType)},
-         {"IsSensorType", which(&Info::IsSensorType)},
-         {"SetAcqMode", test::call_of(info_, &Info::SetAcqMode)},
-         {"IsAcqMode", which(&Info::IsAcqMode)},
-         {"SetProjection", test::call_of(info_, &Info::SetProjection)},
-         {"IsProjection", which(&Info::IsProjection)},
-         {"SetUnitType", test::call_of(info_, &Info::SetUnitType)},
-         {"IsUnitType", which(&Info::IsUnitType)},
-         {"SetRefSys", test::call_of(info_, &Info::SetRefSys)},
-         {"IsRefSys", which(&Info::IsRefSys)},
-         {"SetType", test::call_of(info_, &Info::SetType)},
-         {"IsType", test::call_of(info_, &Info::IsType)},
-         {"fillQUOREL", test::call_of(info_, &Info::fillQUOREL)},
-         {"getPolarizationNbr", test::call_of(info_, &Info::getPolarizationNbr)},
-         {"getISNbr", test::call_of(info_, &Info::getISNbr)},
-         {"readBurstTimes", test::call_of(swath_, &SwathInfo::readBurstTimes)},
-         {"times",
-          [this](auto& words, auto&) {
-              return swath_.BurstStartTimes = test::Argument<const double*>{words.text(1)}.values, 0;
-          }},
-         {"clone", [this](auto&, auto&) { return swath_.clone(&copy_); }},
-         {"samples",
-          [this](auto& words, auto&) {
-              pattern_.Pattern = test::Argument<const float*>{words.text(1)}.values;
-              return pattern_.PatternFile.setFilename("pattern"), 0;
-          }},
-         {"getPatternArray",
-          [this](auto& words, auto& told) {
-              test::Argument<float*> room{words.text(2)};
-              const int status = object<AntennaPattern_Obj>(words.text(1))->getPatternArray(room.get());
-              return room.tell(told), status;
-          }},
-         {"WritePatternArray",
-          [this](auto& words, auto&) { return object<AntennaPattern_Obj>(words.text(1))->WritePatternArray(); }},
-         {"createBuffers",
-          [this](auto& words, auto&) { return object<AntennaPattern_Obj>(words.text(1))->createBuffers(); }},
-         {"writeboth",
-          [this](auto& words, auto&) { return object<AntennaPattern_Obj>(words.text(1))->writehdr(); }},
-         {"dc.readparold", test::call_of(dc_, &polyDC::readparold)},
-         {"fr.readparold", test::call_of(fr_, &polyFR::readparold)},
-         {"point.readhdr", [this](auto& words, auto&) { return point_.readhdr(words.text(1), words.text(2)); }},
-         {"point.writehdr",
-          [this](auto& words, auto&) { return point_.writehdr(words.text(1), words.text(2)); }},
-         {"CreatePolys", test::call_of(set_, static_cast<int (polySAR::*)(int, int, int, int, int, int)>(&polySAR::CreatePolys))},
-         {"chirpSamples", test::call_of(pulse_, &SARPulse_Obj::chirpSamples)},
-         {"generateChirp", [this](auto& words, auto& told) {
+    calls.merge(QUO_MEMBERS(a_, &ROI_Obj::SetFastAxe, &ROI_Obj::SetSlowAxe, &ROI_Obj::ResetROI,
+                            &ROI_Obj::GetFastIndex, &ROI_Obj::GetSlowIndex, &ROI_Obj::GetFastRange,
+                            &ROI_Obj::GetSlowRange, &ROI_Obj::write_roi));
+    calls.merge(QUO_MEMBERS(file_, &FileROI_Obj::SetFile));
+    calls.merge(QUO_MEMBERS(info_, &Info::SetImageType, &Info::SetSensorType, &Info::SetAcqMode,
+                            &Info::SetProjection, &Info::SetUnitType, &Info::SetRefSys, &Info::SetType,
+                            &Info::IsType, &Info::fillQUOREL, &Info::getPolarizationNbr, &Info::getISNbr));
+    calls.merge(QUO_MEMBERS(swath_, &SwathInfo::readBurstTimes));
+    calls.merge(QUO_MEMBERS(pulse_, &SARPulse_Obj::chirpSamples));
+    calls.merge(test::Calls{
+        {"get", [&](auto& words, auto& told) { return get(words, told); }},
+        {"set", [&](auto& words, auto&) { return set(words); }},
+        {"readhdr", [&](auto& words, auto&) { return header(words)->readhdr(words.text(2)); }},
+        {"writehdr", [&](auto& words, auto&) { return header(words)->writehdr(words.text(2)); }},
+        {"golden",
+         [](auto& words, auto&) {  // a file of the test data, behind what is there
+             return test::write_text(words.text(1),
+                                     test::read_text(words.text(1)) +
+                                         test::read_text(std::string{QUO_TEST_DATA "/objects/"} + words.text(2))),
+                    0;
+         }},
+        {"replace",
+         [](auto& words, auto&) {
+             std::string text = test::read_text(words.text(1));
+             const std::string from = words.text(2);
+             return test::write_text(words.text(1), text.replace(text.find(from), from.size(), words.text(3))), 0;
+         }},
+        {"isNULL", [&](auto& words, auto&) { return object<ROI_Obj>(words.text(1))->isNULL(); }},
+        {"corners",
+         [this](auto&, auto& told) {
+             for (const ROI_Time& corner :
+                  {a_.GetUpLeft(), a_.GetUpRight(), a_.GetDownLeft(), a_.GetDownRight(), a_.GetCenter()})
+                 told += test::digits(corner.FastTime) + " " + test::digits(corner.SlowTime) + "\n";
+             return 0;
+         }},
+        {"IntersectROI",
+         [this](auto& words, auto&) {
+             return ROI_Obj::IntersectROI(object<ROI_Obj>(words.text(1)), object<ROI_Obj>(words.text(2)),
+                                          object<ROI_Obj>(words.text(3)));
+         }},
+        {"GetROI",
+         [this](auto& words, auto&) {
+             return coords_.GetROI(object<ROI_Obj>(words.text(1)), object<ROI_Obj>(words.text(2)));
+         }},
+        {"read_roi", [this](auto&, auto&) { return file_.read_roi(); }},
+        {"file",
+         [this](auto&, auto& told) {
+             return told = file_.FileName + std::string{" "} + file_.SectionName + "\n", 0;
+         }},
+        {"IsImageType", which(&Info::IsImageType)},
+        {"IsSensorType", which(&Info::IsSensorType)},
+        {"IsAcqMode", which(&Info::IsAcqMode)},
+        {"IsProjection", which(&Info::IsProjection)},
+        {"IsUnitType", which(&Info::IsUnitType)},
+        {"IsRefSys", which(&Info::IsRefSys)},
+        {"times",
+         [this](auto& words, auto&) {
+             return swath_.BurstStartTimes = test::Argument<const double*>{words.text(1)}.values, 0;
+         }},
+        {"clone", [this](auto&, auto&) { return swath_.clone(&copy_); }},
+        {"samples",
+         [this](auto& words, auto&) {
+             pattern_.Pattern = test::Argument<const float*>{words.text(1)}.values;
+             return pattern_.PatternFile.setFilename("pattern"), 0;
+         }},
+        {"getPatternArray",
+         [this](auto& words, auto& told) {
+             test::Argument<float*> room{words.text(2)};
+             const int status = object<AntennaPattern_Obj>(words.text(1))->getPatternArray(room.get());
+             return room.tell(told), status;
+         }},
+        {"WritePatternArray",
+         [this](auto& words, auto&) { return object<AntennaPattern_Obj>(words.text(1))->WritePatternArray(); }},
+        {"createBuffers",
+         [this](auto& words, auto&) { return object<AntennaPattern_Obj>(words.text(1))->createBuffers(); }},
+        {"writeboth",
+         [this](auto& words, auto&) { return object<AntennaPattern_Obj>(words.text(1))->writehdr(); }},
+        {"dc.readparold", test::call_of(dc_, &polyDC::readparold)},
+        {"fr.readparold", test::call_of(fr_, &polyFR::readparold)},
+        {"point.readhdr", [this](auto& words, auto&) { return point_.readhdr(words.text(1), words.text(2)); }},
+        {"point.writehdr", [this](auto& words, auto&) { return point_.writehdr(words.text(1), words.text(2)); }},
+        {"CreatePolys",
+         test::call_of(set_, static_cast<int (polySAR::*)(int, int, int, int, int, int)>(&polySAR::CreatePolys))},
+        {"generateChirp", [this](auto& words, auto& told) {
              test::Argument<float*> room{words.text(1)};
              const int status = pulse_.generateChirp(reinterpret_cast<fcomplex*>(room.get()));
-             return room.tell(told), status; }}});
+             return room.tell(told), status;
+         }}});
     run(kScript, calls);
 }
 INSTANTIATE_TEST_SUITE_P(Script, Session, testing::ValuesIn(test::sessions_of(kScript)),

@@ -258,37 +258,6 @@ TEST(EveryCall, SaysTheSameInAllItsForms) {
     EXPECT_TRUE(std::isnan(empty.SVGetPos(t)[0]) && std::isnan(empty.SVGetVel(t)[2]));
 }
 
-TEST(Sat2Earth, MeetsAHeightAndNamesTheGroundItCannotSee) {
-    test::Flight flight{kTimes};
-    GeneralSAROrbit& orbit = flight.orbit;
-    const test::Report report;
-    Vec3 p{1.5, 2.5, 3.5};
-    for (const double range : {4e-3, 5e-2, -5.4e-3}) {
-        const int status = range > 0.0 ? QUO_NUMERIC : QUO_REFUSED;
-        EXPECT_EQ(orbit.sat2earth(kTimes.at(3), range, p.v), status);
-        EXPECT_EQ(orbit.sat2earth(kTimes.at(3), range, 0.0, 17.3, p.v), status);
-    }
-    EXPECT_EQ(p[0] + p[1] + p[2], 7.5);
-    const auto entries = report.entries("ERROR_CALL_TREE");
-    ASSERT_EQ(entries.size(), 6U);
-    for (const auto& entry : entries) EXPECT_EQ(entry.function, "GeneralSAROrbit::sat2earth");
-    for (const double height : {-413.0, 8848.1}) {
-        const test::Platform platform = flight.state(kTimes.at(3));
-        orbit.setLookSign(height < 0.0 ? -1 : 1);
-        ASSERT_EQ(orbit.sat2earth(kTimes.at(3), 5.4e-3, 812.5, height, p.v), 0);
-        GrPtGeometry at;
-        ASSERT_EQ(orbit.SVGetGeometry(kTimes.at(3), 5.4e-3, 812.5, height, &at), 0);
-        EXPECT_TRUE(std::equal(p.v, p.v + 3, at.point_m));
-        EXPECT_NEAR(
-            at.incidence_deg,
-            test::angle_deg(test::local_frame(at.latitude_deg, at.longitude_deg).up, platform.position - p), 1e-9);
-        EXPECT_NEAR(test::height_above_ellipsoid(p), height, 1e-6);
-        EXPECT_NEAR(doppler_of(platform, p, orbit.getLambda()), 812.5, 1e-2);
-        EXPECT_NEAR(test::norm(p - platform.position), 2.7e-3 * test::kLightSpeed, 1e-4);
-        EXPECT_EQ(test::dot(test::cross(platform.velocity, platform.position), p) > 0.0, height > 0.0);
-    }
-}
-
 TEST(RotationMatrix, TurnsTheVelocityAlongTheFirstAxis) {
     double R[9] = {}, speed = 0.0;
     for (const Vec3& v : {Vec3{1.7, -2.3, 0.9}, Vec3{-5031.1, 2290.7, 5180.3}, Vec3{0.0, -3.1, 0.7}}) {

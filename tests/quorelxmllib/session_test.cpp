@@ -24,14 +24,6 @@ int scan(const char* list, Number* values, int count) {
 
 class Session : public test::PlainSession {
 protected:
-    template <typename Result, typename... Parameters>
-    test::Call on(Result (quorelxml::*member)(Parameters...)) {
-        return test::call_of(document_, member);
-    }
-    template <typename Result, typename... Parameters>
-    test::Call on(Result (quorelxml::*member)(Parameters...) const) {
-        return test::call_of(document_, member);
-    }
     test::OpenDocument document_;
     quorelxmlPi styled_;
 };
@@ -43,55 +35,33 @@ TEST_P(Session, AnswersAndWritesWhatTheScriptSays) {
                                           : document_.getNode(words.whole(1), words.text(2));
         return found ? 1 : 0;
     };
-    run(kScript, {{"header", test::call_of(header)},
-                  {"stored", test::call_of(stored)},
-                  {"fits", test::call_of(fits)},
-                  {"is_field_path", test::call_of(is_field_path)},
-                  {"scan_doubles", test::call_of(scan<double>)},
-                  {"scan_floats", test::call_of(scan<float>)},
-                  {"scan_ints", test::call_of(scan<std::int32_t>)},
-                  {"getNode", node},
-                  {"createField",
-                   [this](auto& words, auto&) {
-                       return document_.createField(words.whole(1), words.text(2), words.whole(3));
-                   }},
-                  {"readString",
-                   [this](auto& words, auto& told) {
-                       test::Argument<char* const*> room{words.text(3)};
-                       const int status =
-                           document_.readString(words.whole(1), words.text(2), room.get(), words.whole(4));
-                       return room.tell(told), status;
-                   }},
-                  {"styled",
-                   [this](auto& words, auto&) {
-                       return styled_.initXmlFile(words.text(1), words.text(2)) +
-                              styled_.initXmlFile(words.text(1), words.text(2)) + styled_.write();
-                   }},
-                  {"initXmlFile", on(&quorelxml::initXmlFile)},
-                  {"write", on(&quorelxml::write)},
-                  {"clean", on(&quorelxml::clean)},
-                  {"setDescription", on(&quorelxml::setDescription)},
-                  {"setDebug", on(&quorelxml::setDebug)},
-                  {"readInt", on(&quorelxml::readInt)},
-                  {"readFloat", on(&quorelxml::readFloat)},
-                  {"readDouble", on(&quorelxml::readDouble)},
-                  {"writeInt", on(&quorelxml::writeInt)},
-                  {"writeFloat", on(&quorelxml::writeFloat)},
-                  {"writeDouble", on(&quorelxml::writeDouble)},
-                  {"writeString", on(&quorelxml::writeString)},
-                  {"isRecognized", on(&Open::isRecognized)},
-                  {"loaded", on(&Open::loaded)},
-                  {"numberOfChannels", on(&Open::numberOfChannels)},
-                  {"description", on(&Open::description)},
-                  {"fileName", on(&Open::fileName)},
-                  {"channelExists", on(&Open::channelExists)},
-                  {"fieldExists", on(&Open::fieldExists)},
-                  {"countNodes", on(&Open::countNodes)},
-                  {"fieldHasCount", on(&Open::fieldHasCount)},
-                  {"clearField", on(&Open::clearField)},
-                  {"createChannel", on(&Open::createChannel)},
-                  {"setFormat", on(&Open::setFormat)},
-                  {"format", on(&Open::format)}});
+    test::Calls calls = QUO_MEMBERS(
+        document_, &Open::initXmlFile, &Open::write, &Open::clean, &Open::setDescription, &Open::setDebug,
+        &Open::readInt, &Open::readFloat, &Open::readDouble, &Open::writeInt, &Open::writeFloat,
+        &Open::writeDouble, &Open::writeString, &Open::isRecognized, &Open::loaded, &Open::numberOfChannels,
+        &Open::description, &Open::fileName, &Open::channelExists, &Open::fieldExists, &Open::countNodes,
+        &Open::fieldHasCount, &Open::clearField, &Open::createChannel, &Open::setFormat, &Open::format);
+    calls.merge(QUO_CALLS(header, stored, fits, is_field_path));
+    calls.merge(test::Calls{{"scan_doubles", test::call_of(scan<double>)},
+                            {"scan_floats", test::call_of(scan<float>)},
+                            {"scan_ints", test::call_of(scan<std::int32_t>)},
+                            {"getNode", node},
+                            {"createField",
+                             [this](auto& words, auto&) {
+                                 return document_.createField(words.whole(1), words.text(2), words.whole(3));
+                             }},
+                            {"readString",
+                             [this](auto& words, auto& told) {
+                                 test::Argument<char* const*> room{words.text(3)};
+                                 const int status = document_.readString(words.whole(1), words.text(2), room.get(),
+                                                                         words.whole(4));
+                                 return room.tell(told), status;
+                             }},
+                            {"styled", [this](auto& words, auto&) {
+                                 return styled_.initXmlFile(words.text(1), words.text(2)) +
+                                        styled_.initXmlFile(words.text(1), words.text(2)) + styled_.write();
+                             }}});
+    run(kScript, calls);
 }
 INSTANTIATE_TEST_SUITE_P(Script, Session, testing::ValuesIn(test::sessions_of(kScript)),
                          [](const auto& row) { return row.param; });

@@ -143,16 +143,31 @@ Call call_of(const Object& object, Result (Class::*member)(Parameters...) const)
     return call_of(std::function<Result(Parameters...)>{
         [&object, member](Parameters... parameters) -> Result { return (object.*member)(parameters...); }});
 }
-/** Calls by the names that a list has, separated by commas. */
+/** The names in a list of functions or members, as the preprocessor spells it. */
+inline std::vector<std::string> names_in(const std::string& list) {
+    std::istringstream words{list};
+    std::vector<std::string> names;
+    for (std::string word; words >> word; names.back() = names.back().substr(0, names.back().find(',')))
+        names.push_back(word.substr(word.rfind(':') + 1));
+    return names;
+}
+/** A call of each, by its name; of members with the object in front. */
 template <typename... Functions>
-Calls calls_of(const std::string& list, Functions... functions) {
+Calls calls_of(const std::vector<std::string>& names, Functions... functions) {
     Calls calls;
-    std::istringstream names{list};
-    std::string name;
-    ((names >> name, calls[name.substr(0, name.find(','))] = call_of(functions)), ...);
+    auto name = names.begin();
+    ((calls[*name++] = call_of(functions)), ...);
     return calls;
 }
-#define QUO_CALLS(...) test::calls_of(#__VA_ARGS__, __VA_ARGS__)
+template <typename Object, typename... Members>
+Calls calls_on(Object& object, const std::vector<std::string>& names, Members... members) {
+    Calls calls;
+    auto name = names.begin();
+    ((calls[*name++] = call_of(object, members)), ...);
+    return calls;
+}
+#define QUO_CALLS(...) test::calls_of(test::names_in(#__VA_ARGS__), __VA_ARGS__)
+#define QUO_MEMBERS(object, ...) test::calls_on(object, test::names_in(#__VA_ARGS__), __VA_ARGS__)
 
 /** A session with a report, in a folder of its own, which is the current one. */
 class PlainSession : public testing::TestWithParam<std::string> {
