@@ -104,6 +104,22 @@ TEST(CallFrame, ReportsErrnoOnceAndClearsIt) {
     }
 }
 
+TEST(CallFrame, OnlyAVerdictOfSuccessKeepsTheBlocks) {
+    test::Report report;
+    void *kept = malloc_ckerr(1), *made = nullptr;
+    {
+        CallFrame outer{"outer()", kSource};
+        made = malloc_ckerr(40);
+        {
+            CallFrame inner{"inner()", kSource};
+            ASSERT_NE(malloc_ckerr(3), nullptr);
+        }
+        ASSERT_EQ(outer.success(), 0);
+    }
+    std::memset(made, 1, 40);
+    for (void* block : {made, kept}) free_ckerr(block);
+}
+
 // ---- The buffer
 
 // A null entry once stayed behind in the table and showed as a leak of a function that had dealt with the failure.
