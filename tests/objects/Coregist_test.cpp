@@ -77,25 +77,4 @@ TEST_P(Mappings, HaveASampleFormThatSaysTheSame) {
     expect_agreement();
 }
 
-TEST(Coregist, RefusesWhatHasNoInverse) {
-    const test::Report report;
-    Coregist fit;  // all zero
-    double range = 5.0, azimuth = 6.0;
-    EXPECT_EQ(fit.evaluateMAtime(1.0, 1.0, &range, &azimuth), 10);
-    fit.RgFit[0] = -1.0;  // a parabola that never reaches the time
-    fit.RgFit[1] = 0.1;
-    fit.AzFit[2] = 1.0;
-    fit.init();
-    EXPECT_EQ(fit.evaluateMAtime(1.0, 1.0, &range, &azimuth), 10);
-    EXPECT_EQ(10.0 * range + azimuth, 56.0);
-    EXPECT_TRUE(std::isnan(fit.evaluateMAtimeRange(1.0, 1.0)));
-    ROI_Obj empty;
-    EXPECT_EQ(fit.Time2Samples(&empty, &empty) + fit.Time2Samples(nullptr, &empty), 2);
-    EXPECT_EQ(fit.ConvertPolys(&empty, &empty) + fit.ConvertPolys(&empty, nullptr), 2);
-    EXPECT_EQ(fit.readpar(report.file("missing.xml").c_str()), 1);
-    const std::vector<std::string> messages = report.messages("ERROR");
-    EXPECT_EQ(std::ranges::count(messages, "The mapping has no inverse there"), 3);
-    EXPECT_EQ(messages.back(), "Fit polynomials read error");
-}
-
 }  // namespace

@@ -140,20 +140,6 @@ TEST_F(Product, LeavesNoTraceAmongTheParameterFiles) {
     FreeProfile(nullptr);
 }
 
-// Names are text: never a format, and never cut into another message.
-TEST_F(Product, SaysThatAFileDoesNotExist) {
-    GeneralSAR product;
-    fill_product(product);
-    const std::string missing = report_.file("missing.xml"), endless(5000, 'n');
-    for (const char* name : {missing.c_str(), static_cast<const char*>(nullptr), "%s%n%d", endless.c_str()})
-        EXPECT_EQ(product.GSread(name), 1);
-    EXPECT_THAT(report_.messages("ERROR"), testing::IsSupersetOf({"File : " + missing + " DOES NOT EXIST!",
-                                                                  std::string{"File :  DOES NOT EXIST!"},
-                                                                  std::string{"File : %s%n%d DOES NOT EXIST!"}}));
-    EXPECT_EQ(present_in(product), test::all_objects());
-    EXPECT_FALSE(std::filesystem::exists(missing));
-}
-
 TEST_F(Product, IsReleasedByReadingAndDestroying) {
     for (const bool reading : {true, false}) {
         GeneralSAR p;

@@ -8,19 +8,6 @@ namespace {
 
 using testing::Each, testing::ElementsAre;
 
-// What else may be missing is tested with every object.
-TEST(GeoGrid, KeepsAPointThatIsMissing) {
-    const test::TemporaryFolder folder;
-    const std::string file = folder.file("header.xml");
-    geoCoords_Obj source, target;
-    test::fill(source);
-    const std::string whole = test::read_text(QUO_TEST_DATA "/objects/geoCoords_Obj.xml");
-    test::write_text(file, test::without_element(whole, "SouthWest"));
-    EXPECT_EQ(target.readhdr(file.c_str()), 0);
-    EXPECT_THAT(test::differences(source, target), ElementsAre("SouthWest.Point", "SouthWest.members"));
-    EXPECT_EQ(target.SouthWest.Latitude, -999.0);
-}
-
 TEST(GeoGrid, KeepsTheRasterInItsSideFile) {
     const test::TemporaryFolder folder;
     const std::string header = folder.file("scene.xml"), raster = folder.file("scene");

@@ -80,13 +80,15 @@ protected:
     polyFR fr_;
     polySAR set_;
     SARPulse_Obj pulse_;
+    Coregist fit_;
+    GeneralSAR product_;
     geopoint point_;
     geoCoords_Obj grid_;
     const std::map<std::string, GeneralSAR_BaseXML*> objects_ = {
-        {"a", &a_},        {"b", &b_},         {"out", &out_},     {"file", &file_},       {"coords", &coords_},
-        {"info", &info_},  {"swath", &swath_}, {"copy", &copy_},   {"pattern", &pattern_}, {"target", &target_},
-        {"dc", &dc_},      {"fr", &fr_},       {"point", &point_}, {"grid", &grid_},       {"set", &set_},
-        {"pulse", &pulse_}};
+        {"a", &a_},         {"b", &b_},         {"out", &out_},     {"file", &file_},       {"coords", &coords_},
+        {"info", &info_},   {"swath", &swath_}, {"copy", &copy_},   {"pattern", &pattern_}, {"target", &target_},
+        {"dc", &dc_},       {"fr", &fr_},       {"point", &point_}, {"grid", &grid_},       {"set", &set_},
+        {"pulse", &pulse_}, {"fit", &fit_}};
 };
 
 TEST_P(Session, AnswersAndWritesWhatTheScriptSays) {
@@ -100,6 +102,9 @@ TEST_P(Session, AnswersAndWritesWhatTheScriptSays) {
                             &Info::SetProjection, &Info::SetUnitType, &Info::SetRefSys, &Info::SetType,
                             &Info::IsType, &Info::fillQUOREL, &Info::getPolarizationNbr, &Info::getISNbr));
     calls.merge(QUO_MEMBERS(swath_, &SwathInfo::readBurstTimes));
+    calls.merge(QUO_MEMBERS(fit_, &Coregist::init, &Coregist::evaluateMAtime, &Coregist::evaluateMAtimeRange,
+                            &Coregist::readpar));
+    calls.merge(QUO_MEMBERS(product_, &GeneralSAR::GSread, &GeneralSAR::GSenable, &GeneralSAR::GSexists));
     calls.merge(QUO_MEMBERS(pulse_, &SARPulse_Obj::chirpSamples));
     calls.merge(test::Calls{
         {"get", [&](auto& words, auto& told) { return get(words, told); }},
@@ -118,6 +123,20 @@ TEST_P(Session, AnswersAndWritesWhatTheScriptSays) {
              std::string text = test::read_text(words.text(1));
              const std::string from = words.text(2);
              return test::write_text(words.text(1), text.replace(text.find(from), from.size(), words.text(3))), 0;
+         }},
+        {"without",
+         [](auto& words, auto&) {
+             return test::write_text(words.text(1),
+                                     test::without_element(test::read_text(words.text(1)), words.text(2))),
+                    0;
+         }},
+        {"Time2Samples",
+         [this](auto& words, auto&) {
+             return fit_.Time2Samples(object<ROI_Obj>(words.text(1)), object<ROI_Obj>(words.text(2)));
+         }},
+        {"ConvertPolys",
+         [this](auto& words, auto&) {
+             return fit_.ConvertPolys(object<ROI_Obj>(words.text(1)), object<ROI_Obj>(words.text(2)));
          }},
         {"isNULL", [&](auto& words, auto&) { return object<ROI_Obj>(words.text(1))->isNULL(); }},
         {"corners",
