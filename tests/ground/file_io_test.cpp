@@ -161,4 +161,31 @@ TEST_F(AtomicFileTest, LeavesAFileToItsGroup) {
     expect_header("new");
 }
 
+// The next save of a file sweeps what killed processes left, but never a living one's.
+TEST_F(AtomicFileTest, SweepsWhatKilledProcessesLeft) {
+    const pid_t child = fork();
+    if (child == 0) _exit((new AtomicFile{name_.c_str()})->write("half") ? 0 : 1);
+    waitpid(child, nullptr, 0);
+    expect_header("old", 1);
+    AtomicFile living{name_.c_str()};
+    EXPECT_TRUE(living.write("first") && replace(name_, "second"));
+    expect_header("second", 1);
+    EXPECT_TRUE(living.commit());
+    expect_header("first");
+}
+
+// A raster is of no use with the description of another.
+TEST_F(AtomicFileTest, ReplacesBothFilesOfAPairOrNone) {
+    const std::string other = folder_.file("other");
+    for (const bool fails : {true, false}) {
+        fs::remove_all(other);
+        AtomicFile first{name_.c_str()}, second{other.c_str()};
+        EXPECT_TRUE(first.write("new") && second.write("its description"));
+        if (fails) fs::create_directory(other);
+        EXPECT_EQ(commit_pair(first, second), !fails);
+        EXPECT_EQ(fs::is_directory(other), fails);
+        expect_header(fails ? "old" : "new", 1);
+    }
+}
+
 }  // namespace
