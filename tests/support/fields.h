@@ -66,14 +66,6 @@ inline std::vector<std::string> differing_fields(const GeneralSAR_BaseXML& a, co
     return names;
 }
 
-/** Names of all elements, in the order of registration. */
-inline std::vector<std::string> field_names(const GeneralSAR_BaseXML& object) {
-    std::vector<std::string> names;
-    names.reserve(static_cast<std::size_t>(object.elementCount()));
-    for (int i = 0; i < object.elementCount(); ++i) names.emplace_back(object.element(i)->name);
-    return names;
-}
-
 /** What is promised of a field. */
 struct ListedField {
     std::string key;          ///< in parameter files; "-" where it is not read from them, empty where none is read
@@ -116,20 +108,6 @@ inline std::string without_element(std::string file, const std::string& name) {
     const auto start = file.find("<" + name + ">"), end = file.find("</" + name + ">");
     EXPECT_TRUE(start != file.npos && end != file.npos) << name;
     return file.erase(start, end + name.size() + 3 - start);
-}
-
-/** Names of the children of an element, which stand in lines of their own two blanks further in. */
-inline std::vector<std::string> child_names(const std::string& file, const std::string& parent) {
-    std::vector<std::string> names;
-    std::istringstream lines{file};
-    std::string line;
-    while (std::getline(lines, line) && line.find("<" + parent + ">") == line.npos) {
-    }
-    const std::string inside = line.substr(0, line.find('<')) + "  <", end = "</" + parent;
-    while (std::getline(lines, line) && line.find(end) == line.npos)
-        if (line.starts_with(inside) && line[inside.size()] != '/')
-            names.push_back(line.substr(inside.size(), line.find_first_of(" />", inside.size()) - inside.size()));
-    return names;
 }
 
 }  // namespace test
