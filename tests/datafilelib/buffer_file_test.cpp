@@ -1,11 +1,3 @@
-#include <gtest/gtest.h>
-
-#include <cerrno>
-#include <random>
-#include <string>
-#include <tuple>
-#include <vector>
-
 #include "quo_base/datafile.h"
 #include "support/diagnostics.h"
 

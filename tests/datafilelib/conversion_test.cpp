@@ -1,15 +1,4 @@
 // Every pair of cell type and memory type, in rasters of different layouts, against the rules told one by one.
-#include <gtest/gtest.h>
-
-#include <cmath>
-#include <cstdint>
-#include <cstring>
-#include <limits>
-#include <ostream>
-#include <string>
-#include <type_traits>
-#include <utility>
-#include <vector>
 
 #include "quo_base/datafile.h"
 #include "support/diagnostics.h"

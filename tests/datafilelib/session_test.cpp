@@ -1,19 +1,6 @@
 // Runs the sessions of data/rasters/sessions.txt.
 #include "support/session.h"
 
-#include <gtest/gtest.h>
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <algorithm>
-#include <cerrno>
-#include <csignal>
-#include <filesystem>
-#include <functional>
-#include <map>
-#include <optional>
-#include <string>
-
 #include "quo_base/datafile.h"
 #include "support/limits.h"
 
