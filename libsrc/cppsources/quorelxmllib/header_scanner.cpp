@@ -24,7 +24,7 @@ constexpr std::array<std::uint8_t, 256> kClasses = [] {
             static_cast<std::uint8_t>((letter ? kNameStart : 0) | (in_name ? kNameCharacter : 0) |
                                       (markup || c == '"' ? 0 : kValueCharacter) | (markup ? 0 : kTextCharacter));
     }
-    for (const std::size_t blank : {' ', '\n', '\t'}) classes[blank] |= kBlank | kTextCharacter;
+    for (const unsigned char blank : {' ', '\n', '\t'}) classes[blank] |= kBlank | kTextCharacter;
     return classes;
 }();
 bool is(std::uint8_t part, char c) noexcept { return (kClasses[static_cast<unsigned char>(c)] & part) != 0; }
