@@ -46,6 +46,8 @@ constexpr Journey kJourneys[] = {
     {"ThreeQuartersOfARevolution", 693e3, 41.3, 12.8, -12.7, 60.0, 77, 0.0, 0.0, true},
     {"ManyVectorsSquintedFar", 693e3, 41.3, 12.8, -12.7, 10.0, 100, 15.0, 45.0, true},
     {"TwoRevolutions", 693e3, 41.3, 12.8, -12.7, 10.0, 1200, 0.0, 4.0, false},
+    {"EightRevolutions", 693e3, 41.3, 12.8, -12.7, 10.0, 5000, 0.0, 4.0, false},
+    {"VeryManyVectorsSquintedFar", 693e3, 41.3, 12.8, -12.7, 0.05, 3201, 0.0, 45.0, true},
     {"NavigationSatellite", 20200e3, 10.0, 12.8, 40.0, 60.0, 360, 0.0, 0.0, false},
     {"GeostationaryHeightADay", 35786e3, 10.0, 12.8, 60.0, 300.0, 289, 0.0, 0.0, false},
 };
