@@ -16,6 +16,13 @@ extern const KernelTable kTable;  ///< for every processor
 namespace kernels_avx2 {
 extern const KernelTable kTable;  ///< for processors with AVX2; the same results
 }
+namespace kernels_avx512 {
+extern const KernelTable
+    kTable;  ///< for processors with AVX-512, bytes and short vectors included; the same results
+}
+
+/** The kernels with the widest vectors that this processor has, of at most so many bits. */
+const KernelTable& kernel_table(int widest) noexcept;
 
 }  // namespace quo
 

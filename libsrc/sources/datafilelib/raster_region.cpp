@@ -16,6 +16,8 @@ namespace {
 
 // Large enough to make system calls rare, small enough to stay in the second-level cache while it is converted.
 constexpr std::int64_t kChunk = std::int64_t{1} << 19;
+// More for writing, where each call costs a journal's entry beside the copying.
+constexpr std::int64_t kWriteChunk = 2 * kChunk;
 // Pieces nearer to each other than this are read in one transfer with what lies between.
 constexpr std::int64_t kSmallGap = 4096;
 
@@ -199,7 +201,7 @@ int write_region(const RasterStream& stream, const RasterRegion& region, const R
                  const char* from) {
     if (region.count == 0 || region.piece == 0) return QUO_OK;
     const bool gapless = region.distance == region.piece;
-    const std::int64_t at_once = gapless ? std::max<std::int64_t>(1, kChunk / region.piece) : 1;
+    const std::int64_t at_once = gapless ? std::max<std::int64_t>(1, kWriteChunk / region.piece) : 1;
     TrackedBuffer<char> scratch{static_cast<std::size_t>(std::min(at_once, region.count) * region.piece)};
     if (!scratch) return QUO_NO_MEMORY;
     for (std::int64_t done = 0; done < region.count; done += at_once) {

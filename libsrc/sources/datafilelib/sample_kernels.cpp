@@ -9,16 +9,18 @@ constexpr std::size_t kSizes[kCellTypes] = {8, 4, 16, 8, 8, 4, 4, 2, 2, 1};
 
 bool is_cell_type(int code) noexcept { return code >= 0 && code < kCellTypes; }
 
-const KernelTable& table_for_this_processor() noexcept {
-    static const KernelTable& table = __builtin_cpu_supports("avx2") ? kernels_avx2::kTable : kernels_any::kTable;
-    return table;
-}
-
 }  // namespace
+
+const KernelTable& kernel_table(int widest) noexcept {
+    const bool has_avx512 = __builtin_cpu_supports("avx512bw") && __builtin_cpu_supports("avx512vl");
+    if (widest >= 512 && has_avx512) return kernels_avx512::kTable;
+    return widest >= 256 && __builtin_cpu_supports("avx2") ? kernels_avx2::kTable : kernels_any::kTable;
+}
 
 SampleKernel find_kernel(SampleAccess access, int file_type, int memory_type) noexcept {
     if (!is_cell_type(file_type) || !is_cell_type(memory_type)) return nullptr;
-    return table_for_this_processor().kernels[static_cast<int>(access)][memory_type][file_type];
+    static const KernelTable& table = kernel_table(512);
+    return table.kernels[static_cast<int>(access)][memory_type][file_type];
 }
 
 std::size_t sample_size(int cell_type) noexcept { return is_cell_type(cell_type) ? kSizes[cell_type] : 0; }
