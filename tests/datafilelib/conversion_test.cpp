@@ -220,7 +220,8 @@ To rounded(From number) {
                : static_cast<To>(std::clamp<double>(std::round(number), std::numeric_limits<To>::min(), high));
 }
 template <typename From, typename To>
-void expect_rounding(int real, int integer) {
+void expect_rounding(int real, To) {
+    constexpr int integer = sizeof(To) == 4 ? INT32 : sizeof(To) == 2 ? INT16 : INT8;
     std::vector<From> numbers;
     for (const double edge :
          {0.0, 0.49999997, 2.5, 126.5, 127.5, 32766.5, 32767.5, 32768.5, 8388607.5, 2147483520.0, 2147483646.5,
@@ -244,12 +245,10 @@ void expect_rounding(int real, int integer) {
     }
 }
 TEST(Rounding, IsHalfAwayFromZeroHeldAtTheBoundsAtEveryWidth) {
-    expect_rounding<float, std::int32_t>(FLOAT32, INT32);
-    expect_rounding<float, std::int16_t>(FLOAT32, INT16);
-    expect_rounding<float, std::int8_t>(FLOAT32, INT8);
-    expect_rounding<double, std::int32_t>(FLOAT64, INT32);
-    expect_rounding<double, std::int16_t>(FLOAT64, INT16);
-    expect_rounding<double, std::int8_t>(FLOAT64, INT8);
+    const auto into = [](auto... to) {
+        ((expect_rounding<float>(FLOAT32, to), expect_rounding<double>(FLOAT64, to)), ...);
+    };
+    into(std::int32_t{}, std::int16_t{}, std::int8_t{});
 }
 
 TEST(Kernels, GiveTheSameBytesAtEveryWidth) {
