@@ -181,19 +181,19 @@ private:
 template <typename Matrix>
 class Factoring {
 public:
-    /** exchanged[j] becomes the row that stage j swaps with row j. */
-    Factoring(const Matrix& a, int n, double* scale, int* exchanged)
-        : a_{a}, n_{n}, scale_{scale}, exchanged_{exchanged}, solver_{a, n, a}, product_{a, a} {}
+    Factoring(const Matrix& a, int n, double* scale)
+        : a_{a}, n_{n}, scale_{scale}, solver_{a, n, a}, product_{a, a} {}
 
-    /** The parity of the exchanges. */
-    double run() {
+    /** exchanged[j] becomes the row that stage j swaps with row j. The parity of the exchanges. */
+    double run(int* exchanged) {
+        exchanged_ = exchanged;
         factor({0, n_});
         return parity_;
     }
 
 private:
-    // These columns of the rows from their diagonal on. Many are halved: the left ones first, then the
-    // right ones less what the left ones take from them, in the order of the stages.
+    // These columns of the rows from their diagonal on. Many are halved: the left ones first, then the right ones
+    // less what the left ones take from them, in the order of the stages.
     void factor(Range columns) {
         if (columns.count() > leaf_of(n_)) {
             const Range left = columns.upper_half(), right = columns.lower_half();
@@ -227,7 +227,7 @@ private:
     const Matrix& a_;
     int n_;
     double* scale_;
-    int* exchanged_;
+    int* exchanged_ = nullptr;
     TriangularSolver<Matrix, Matrix> solver_;
     Product<Matrix, Matrix> product_;
     double parity_ = 1.0;
@@ -260,7 +260,7 @@ int tracked_ludcmp(const Matrix& a, int n, int* exchanged, double* parity) {
         quo::say("Singular matrix in lud decomposition");
         return frame.silent(QUO_NUMERIC);
     }
-    *parity = Factoring<Matrix>{a, n, scale.data(), exchanged}.run();
+    *parity = Factoring<Matrix>{a, n, scale.data()}.run(exchanged);
     return frame.success();
 }
 
