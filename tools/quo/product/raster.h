@@ -75,6 +75,7 @@ private:
     BufferFile file_;
     std::vector<double> real_;  // of a tile that is read as complex
     std::vector<char> narrow_;  // the 8-bit parts of a tile
+    std::vector<char> lines_;   // of a tile, with what lies between
 };
 
 /** Whether integers of one raster's type fit another's, so that none can be clipped or lost. */
