@@ -105,6 +105,11 @@ protected:
             {"b.close", [&] { return buffer_.close(), buffer_.is_open() ? 1 : 0; }},
             {"b.read", [&] { return tell(n(1), [&](char* to) { return buffer_.read(to, n(1)); }); }},
             {"b.write", [&] { return buffer_.write(from, size()); }},
+            {"b.copyFrom",
+             [&] {
+                 BufferFile source{name};
+                 return source.open(1), 10 * buffer_.copyFrom(source, n(2)) + source.status();
+             }},
             {"b.seek", [&] { return buffer_.seek(n(1), n(2)), buffer_.tell(); }},
             {"b.tell", [&] { return buffer_.tell(); }},
             {"b.status", [&] { return buffer_.status(); }},
