@@ -21,11 +21,12 @@ using test::Engine;
 using test::Samples;
 
 TEST(FftEngine, AutoPrefersMklOnProcessorsOfItsMakerOnly) {
-    const auto own = quo::engine_order("auto", true), other = quo::engine_order("auto", false);
-    EXPECT_EQ(own.first, quo::engine_order("mkl", false).first);
-    EXPECT_EQ(own.second, quo::engine_order("fftw", true).first);
-    EXPECT_TRUE(other.first == own.second && other.second == own.first);
-    EXPECT_EQ(quo::engine_order("mkl", true).second, nullptr);
+    auto* const mkl = quo::engine_order("mkl", false)[0];
+    auto* const fftw = quo::engine_order("fftw", true)[0];
+    auto* const own = quo::engine_order("quo", true)[0];
+    EXPECT_EQ(quo::engine_order("auto", true), (quo::EngineOrder{mkl, own, fftw}));
+    EXPECT_EQ(quo::engine_order("auto", false), (quo::EngineOrder{own, fftw, mkl}));
+    EXPECT_EQ(quo::engine_order("mkl", true)[1], nullptr);
 }
 
 // FFTW ended the process when an allocation of its own failed, while it planned and while it ran.
@@ -111,7 +112,9 @@ struct CountingEngine final : quo::FftEngine {
         bool run(const float* /*in*/, float* /*out*/, quo::FftFailure& /*why*/) noexcept override { return true; }
     };
     [[nodiscard]] const char* name() const noexcept override { return "counting"; }
-    [[nodiscard]] int tiled_from() const noexcept override { return 2048; }
+    [[nodiscard]] bool wants_tile(const quo::FftGeometry& columns) const noexcept override {
+        return columns.length >= 2048;
+    }
     [[nodiscard]] std::unique_ptr<quo::FftBatch> make(const quo::FftGeometry& /*geometry*/,
                                                       quo::FftFailure& /*why*/) noexcept override {
         ++made;

@@ -42,13 +42,14 @@ public:
     Engine& operator=(const Engine&) = delete;
 };
 
-/** The engines that every plan must work with: FFTW, a stand-in for DFTI, and MKL itself where it is installed. */
+/** The engines that every plan must work with: our own, with FFTW for other lengths, FFTW, a stand-in for DFTI,
+ * and MKL itself where it is installed. */
 struct EngineChoice {
     const char *name, *choice, *mkl;
 };
 inline void PrintTo(const EngineChoice& engine, std::ostream* out) { *out << engine.name; }
 inline constexpr EngineChoice kEngines[] = {
-    {"Fftw", "fftw", ""}, {"DftiStandIn", "mkl", QUO_TEST_FAKE_DFTI}, {"Mkl", "mkl", ""}};
+    {"Auto", "auto", ""}, {"Fftw", "fftw", ""}, {"DftiStandIn", "mkl", QUO_TEST_FAKE_DFTI}, {"Mkl", "mkl", ""}};
 
 class WithEngine : public testing::TestWithParam<EngineChoice> {
 protected:

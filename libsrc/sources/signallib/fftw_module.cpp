@@ -253,8 +253,11 @@ std::unique_ptr<FftBatch> make_batch(const FftGeometry& geometry, FftFailure& wh
 class FftwEngine final : public FftEngine {
 public:
     [[nodiscard]] const char* name() const noexcept override { return "fftw"; }
+    [[nodiscard]] bool takes_real() const noexcept override { return true; }
     // Shorter columns fit the cache as they lie.
-    [[nodiscard]] int tiled_from() const noexcept override { return 256; }
+    [[nodiscard]] bool wants_tile(const FftGeometry& columns) const noexcept override {
+        return columns.length >= 256;
+    }
     [[nodiscard]] std::unique_ptr<FftBatch> make(const FftGeometry& geometry, FftFailure& why) noexcept override {
         return geometry.domain == FftDomain::Real ? make_batch<RealBatch>(geometry, why)
                                                   : make_batch<ComplexBatch>(geometry, why);

@@ -132,8 +132,13 @@ public:
     }
 
     [[nodiscard]] const char* name() const noexcept override { return "mkl"; }
-    // Shorter columns it blocks better by itself.
-    [[nodiscard]] int tiled_from() const noexcept override { return 4096; }
+    [[nodiscard]] bool takes_real() const noexcept override { return true; }
+    // Other columns it blocks better by itself: in long ones whose rows lie whole pages apart it meets but a few
+    // lines of the cache.
+    [[nodiscard]] bool wants_tile(const FftGeometry& columns) const noexcept override {
+        constexpr std::ptrdiff_t kLongColumn = 4096, kPageSamples = 4096 / (2 * sizeof(float));
+        return columns.length >= kLongColumn && columns.stride % kPageSamples == 0;
+    }
     [[nodiscard]] std::unique_ptr<FftBatch> make(const FftGeometry& geometry, FftFailure& why) noexcept override {
         // MKL answers when memory is short, but not where the system promises more than it has.
         const MemoryNeed need = most_memory(geometry);
