@@ -14,7 +14,7 @@ namespace {
 
 /** Rows that are run together: enough for the engine to batch, and in the second cache several times over. */
 constexpr std::ptrdiff_t kRowBlockBytes = 128 << 10;
-/** Samples of a group of columns: bounds what measuring a strided batch costs. */
+/** Samples of a group of columns: long ones are multiplied while they are in some cache. */
 constexpr int kGroupSamples = 1 << 21;
 constexpr int kLine = 16;  ///< groups of columns are multiples of whole cache lines
 
