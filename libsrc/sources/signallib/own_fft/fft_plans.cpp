@@ -104,7 +104,7 @@ Split split_row(PassChoice& passes, int length, int lanes) {
 
 double short_rows_cost(PassChoice& passes, int length, int lanes) {
     if (length > kLongestShortRow) return std::numeric_limits<double>::infinity();
-    const double moves = length < lanes ? kSampleCost : kTransposeCost;
+    const double moves = length < lanes ? kSampleCost : kTransposeCost * packs_of(length, lanes) * lanes / length;
     return (passes.of(length).cost + 2.0 * moves) * length;
 }
 
@@ -184,7 +184,7 @@ std::size_t fft_bytes(const FftKind& kind) noexcept {
     const auto samples = static_cast<std::size_t>(kind.length) * 2 * sizeof(float);
     const auto lanes = static_cast<std::size_t>(kind.lanes);
     const std::size_t copies = kind.way != FftWay::Rows ? 4 * lanes + 1 : kind.length > kLongRow ? 2 : 4;
-    return copies * samples + (std::size_t{1} << 18);
+    return copies * samples + (std::size_t{1} << 19);
 }
 
 FftTables::FftTables(const FftKind& kind) : kind_{kind}, kernels_{*fft_kernels(kind.lanes)} {
@@ -214,19 +214,20 @@ void FftTables::run(const float* in, float* out, std::ptrdiff_t pitch, int count
 
 const FftRoot* FftTables::keep(std::vector<FftRoot> roots) { return roots_.emplace_back(std::move(roots)).data(); }
 
-ShortFft FftTables::take_apart(int length) {
+ShortFft FftTables::take_apart(int length, int together) {
     ShortFft fft;
     fft.length = length;
-    fft.reverse = !kind_.forward;
+    fft.together = together;
+    fft.reverse = !kind_.forward && kind_.way != FftWay::ShortRows;
     PassChoice passes;
     int left = length;
     for (const int radix : passes.of(length).radices) {
         const int count = left / radix;
         const FftRoot* const roots = count > 1 ? keep(root_table(left, true, count, radix, 1)) : nullptr;
-        fft.pass[fft.passes++] = {radix, count, length / left, roots};
+        fft.pass[fft.passes++] = {radix, count, length / left * together, roots};
         left = count;
     }
-    if (fft.passes == 0) fft.pass[fft.passes++] = {1, 1, 1, nullptr};  // one sample is its own transform
+    if (fft.passes == 0) fft.pass[fft.passes++] = {1, 1, together, nullptr};  // one sample is its own transform
     return fft;
 }
 
@@ -234,15 +235,17 @@ LaneFft FftTables::down_lanes(int length, int packs) {
     LaneFft fft;
     const std::ptrdiff_t slot = 2 * std::ptrdiff_t{kind_.lanes};
     if (length <= kOneStep || packs == 0) {
-        fft.first = take_apart(length);
-        fft.stage = length * slot;
+        if (packs == 0) fft.packs = std::clamp(kOneStep / length, 1, kMostShortPacks);
+        fft.mirror = !kind_.forward;
+        fft.first = take_apart(length, fft.packs);
+        fft.stage = length * fft.packs * slot;
         fft.work = 2 * fft.stage;
         return fft;
     }
     PassChoice passes;
     const int second = split_columns(passes, length).second, first = length / second;
-    fft.first = take_apart(first);
-    fft.second = take_apart(second);
+    fft.first = take_apart(first, 1);
+    fft.second = take_apart(second, 1);
     fft.outer = keep(root_table(length, kind_.forward, second, first));
     fft.pitch = second | 1;  // an even one would have slots share a few lines of the cache
     fft.work = 2 * std::max(first, second) * slot;

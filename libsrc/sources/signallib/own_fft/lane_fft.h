@@ -252,7 +252,7 @@ struct LaneFfts {
             (interleaved ? find<true, false, kInner>(pass.radix) : find<false, false, kInner>(pass.radix))(pass,
                                                                                                            route);
             interleaved = false;
-            float* const next = route.out == work ? work + fft.length * kSlot : work;
+            float* const next = route.out == work ? work + fft.length * fft.together * kSlot : work;
             route = {route.out, route.out, next, kSlot, kSlot, outer.roots, outer.lanes};
         }
         route.out = out.at;
@@ -436,48 +436,62 @@ struct LaneFfts {
     // --- Short rows, one a lane
     // ----------------------------------------------------------------------------------
 
-    template <class Move>
-    QUO_FFT_INLINE void each_sample(int rows, int length, const Move& move_one) {
-        for (int r = 0; r < rows; ++r)
-            for (int i = 0; i < length; ++i) move_one(r, i);
+    /** Where sample `i` of a pack stands. */
+    QUO_FFT_INLINE std::ptrdiff_t slot_of(const LaneFft& fft, int pack, int i, bool mirror) {
+        return (std::ptrdiff_t{mirror && i > 0 ? fft.first.length - i : i} * fft.packs + pack) * kSlot;
     }
-    static void into_lanes(const FftRows& rows, int count, int length, float* lanes) {
-        if (length < W)
-            return each_sample(count, length, [&](int r, int i) QUO_FFT_HERE {
-                const float* const from = rows.in + r * rows.distance + 2 * i;
-                lanes[i * kSlot + r] = from[0];
-                lanes[i * kSlot + W + r] = from[1];
+    /** Row by row, for those that are shorter than a vector. */
+    template <class Move>
+    QUO_FFT_INLINE void each_sample(const LaneFft& fft, int pack, bool mirror, const FftRows& rows,
+                                    const Move& move_one) {
+        for (int i = 0; i < fft.first.length; ++i)
+            for (int r = 0; r < rows.count; ++r)
+                move_one(slot_of(fft, pack, i, mirror) + r, r * rows.distance + 2 * i);
+    }
+    static void into_lanes(const LaneFft& fft, int pack, const FftRows& rows, float* lanes) {
+        if (fft.first.length < W)
+            return each_sample(fft, pack, fft.mirror, rows, [&](auto lane, auto sample) QUO_FFT_HERE {
+                lanes[lane] = rows.in[sample];
+                lanes[lane + W] = rows.in[sample + 1];
             });
-        for (int b = 0; b * W < length; ++b)
+        for (int b = 0; b * W < fft.first.length; ++b) {
+            const int first = lane_of(b, fft.first.length);
             transpose_slots(
                 [&](auto r) QUO_FFT_HERE {
-                    return load<true>(rows.in + (r < count ? r : 0) * rows.distance + 2 * lane_of(b, length));
+                    return load<true>(rows.in + (r < rows.count ? r : 0) * rows.distance + 2 * first);
                 },
-                [&](auto i, C c) QUO_FFT_HERE { save<false>(c, lanes + (lane_of(b, length) + i) * kSlot); });
+                [&](auto i, C c)
+                    QUO_FFT_HERE { save<false>(c, lanes + slot_of(fft, pack, first + i, fft.mirror)); });
+        }
     }
-    static void out_of_lanes(const float* lanes, const FftRows& rows, int count, int length) {
-        if (length < W)
-            return each_sample(count, length, [&](int r, int i) QUO_FFT_HERE {
-                float* const to = rows.out + r * rows.distance + 2 * i;
-                to[0] = lanes[i * kSlot + r];
-                to[1] = lanes[i * kSlot + W + r];
+    static void out_of_lanes(const LaneFft& fft, int pack, const float* lanes, const FftRows& rows) {
+        if (fft.first.length < W)
+            return each_sample(fft, pack, false, rows, [&](auto lane, auto sample) QUO_FFT_HERE {
+                rows.out[sample] = lanes[lane];
+                rows.out[sample + 1] = lanes[lane + W];
             });
-        for (int b = 0; b * W < length; ++b)
+        for (int b = 0; b * W < fft.first.length; ++b) {
+            const int first = lane_of(b, fft.first.length);
             transpose_slots([&](auto i)
-                                QUO_FFT_HERE { return load<false>(lanes + (lane_of(b, length) + i) * kSlot); },
+                                QUO_FFT_HERE { return load<false>(lanes + slot_of(fft, pack, first + i, false)); },
                             [&](auto r, C c) QUO_FFT_HERE {
-                                if (r < count)
-                                    save<true>(c, rows.out + r * rows.distance + 2 * lane_of(b, length));
+                                if (r < rows.count) save<true>(c, rows.out + r * rows.distance + 2 * first);
                             });
+        }
     }
     static void short_rows(const LaneFft& fft, const FftRows& rows, float* room) noexcept {
         float* const lanes = room + fft.work;
-        for (std::ptrdiff_t row = 0; row < rows.count; row += W) {
-            const int some = rows.count - row < W ? static_cast<int>(rows.count - row) : W;
-            const FftRows pack{rows.in + row * rows.distance, rows.out + row * rows.distance, rows.distance, some};
-            into_lanes(pack, some, fft.first.length, lanes);
+        for (int row = 0; row < rows.count;) {
+            FftRows pack[kMostShortPacks];
+            int packs = 0;
+            for (; packs < fft.packs && row < rows.count; ++packs, row += W) {
+                const std::ptrdiff_t offset = row * rows.distance;
+                pack[packs] = {rows.in + offset, rows.out + offset, rows.distance,
+                               rows.count - row < W ? rows.count - row : W};
+                into_lanes(fft, packs, pack[packs], lanes);
+            }
             run(fft.first, {lanes, kSlot, false}, {lanes, kSlot, false}, {}, room);
-            out_of_lanes(lanes, pack, some, fft.first.length);
+            for (int b = 0; b < packs; ++b) out_of_lanes(fft, b, lanes, pack[b]);
         }
     }
 
