@@ -103,6 +103,10 @@ inline Exact direct(const fcomplex* x, int n, int m, double w, double a) {
             out[static_cast<std::size_t>(k)] += dcomplex{x[j]} * std::polar(1.0, -j * (a - k * w));
     return out;
 }
+/** Without a look for infinities, which the library's own product takes. */
+inline dcomplex times(dcomplex a, dcomplex b) {
+    return {a.real() * b.real() - a.imag() * b.imag(), a.real() * b.imag() + a.imag() * b.real()};
+}
 /** The transform in double precision: of a prime length by the definition, else by transforms of a prime factor.
  */
 inline Exact exact_dft(const Exact& x) {
@@ -118,7 +122,7 @@ inline Exact exact_dft(const Exact& x) {
         Exact part;
         for (std::size_t k = j; k < n; k += p) part.push_back(x[k]);
         if (p < n) part = exact_dft(part);
-        for (std::size_t k = 0, e = 0; k < n; ++k, e = (e + j) % n) out[k] += part[k % part.size()] * roots[e];
+        for (std::size_t k = 0, e = 0; k < n; ++k, e = (e + j) % n) out[k] += times(part[k % part.size()], roots[e]);
     }
     return out;
 }

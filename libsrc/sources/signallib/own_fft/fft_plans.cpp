@@ -62,43 +62,19 @@ struct Split {
 
 int packs_of(int count, int lanes) { return count / lanes + (count % lanes != 0 ? 1 : 0); }
 
-/** Buffers beyond the first cache cost something. */
-double step_cost(PassChoice& passes, int length) { return passes.of(length).cost + 0.004 * length; }
-
-/** Calls `look` with every pair of factors of a length. */
-template <typename Look>
-void each_split(int length, const Look& look) {
-    for (int d = 1; d <= length / d; ++d) {
-        if (length % d != 0) continue;
-        look(d, length / d);
-        look(length / d, d);
+/** The cheapest two steps of a length, of which each works on whole packs of lanes; columns, which share none, on
+ * packs of one. The cost is that of one value. */
+Split split(PassChoice& passes, int length, int lanes) {
+    Split best;
+    // Buffers beyond the first cache cost something.
+    const auto step = [&](int steps) { return passes.of(steps).cost + 0.004 * steps; };
+    const auto filled = [&](int count) { return static_cast<double>(packs_of(count, lanes)) * lanes / count; };
+    for (int second = lanes; second <= length / lanes && second / 64 <= length / second; ++second) {
+        const int first = length / second;
+        if (length % second != 0) continue;
+        const double cost = filled(second) * step(first) + filled(first) * (step(second) + kTransposeCost);
+        if (cost < best.cost) best = {cost, second};
     }
-}
-
-/** Both steps of columns. */
-Split split_columns(PassChoice& passes, int length) {
-    Split best;
-    each_split(length, [&](int second, int first) {
-        const double cost = step_cost(passes, first) + step_cost(passes, second);
-        if (cost < best.cost) best = {cost, second};
-    });
-    return best;
-}
-
-double lane_cost(PassChoice& passes, int length) {
-    return length <= kOneStep ? passes.of(length).cost : split_columns(passes, length).cost;
-}
-
-/** Both steps of a row whose lanes are filled; none for lengths that cannot fill them. */
-Split split_row(PassChoice& passes, int length, int lanes) {
-    Split best;
-    each_split(length, [&](int second, int first) {
-        if (second < lanes || first < lanes) return;
-        const double cost =
-            static_cast<double>(packs_of(second, lanes)) * first * lane_cost(passes, first) +
-            static_cast<double>(packs_of(first, lanes)) * second * (lane_cost(passes, second) + kTransposeCost);
-        if (cost < best.cost) best = {cost, second};
-    });
     return best;
 }
 
@@ -150,6 +126,22 @@ int lane_of(int pack, int lanes, int count) { return std::min(pack * lanes, coun
 
 }  // namespace
 
+extern const FftKernels kFftKernels4;
+#if defined(QUO_WIDE_LANES)
+extern const FftKernels kFftKernels8, kFftKernels16;
+#endif
+
+const FftKernels* fft_kernels(int lanes) noexcept {
+    if (lanes == 4) return &kFftKernels4;
+#if defined(QUO_WIDE_LANES)
+    __builtin_cpu_init();
+    if (lanes == 8 && __builtin_cpu_supports("avx2")) return &kFftKernels8;
+    if (lanes == 16 && __builtin_cpu_supports("avx512f") && __builtin_cpu_supports("avx512dq"))
+        return &kFftKernels16;
+#endif
+    return nullptr;
+}
+
 bool is_own_fft_length(int length) noexcept {
     for (const int prime : {2, 3, 5, 7})
         while (length % prime == 0) length /= prime;
@@ -171,7 +163,8 @@ FftKind choose_fft(const FftGeometry& geometry, int widest) {
         if (geometry.stride != 1) {
             offer(FftWay::Columns, lanes, packs);
         } else {
-            offer(FftWay::Rows, lanes, geometry.count * split_row(passes, geometry.length, lanes).cost);
+            offer(FftWay::Rows, lanes,
+                  split(passes, geometry.length, lanes).cost * geometry.length * geometry.count / lanes);
             offer(FftWay::ShortRows, lanes, packs * short_rows_cost(passes, geometry.length, lanes));
         }
     }
@@ -243,7 +236,7 @@ LaneFft FftTables::down_lanes(int length, int packs) {
         return fft;
     }
     PassChoice passes;
-    const int second = split_columns(passes, length).second, first = length / second;
+    const int second = split(passes, length, 1).second, first = length / second;
     fft.first = take_apart(first, 1);
     fft.second = take_apart(second, 1);
     fft.outer = keep(root_table(length, kind_.forward, second, first));
@@ -257,7 +250,7 @@ LaneFft FftTables::down_lanes(int length, int packs) {
 RowFft FftTables::along_row() {
     PassChoice passes;
     RowFft row;
-    const int second = split_row(passes, kind_.length, kind_.lanes).second, first = kind_.length / second;
+    const int second = split(passes, kind_.length, kind_.lanes).second, first = kind_.length / second;
     const std::ptrdiff_t slot = 2 * std::ptrdiff_t{kind_.lanes};
     row.first = down_lanes(first, 1);
     row.second = down_lanes(second, 1);

@@ -414,6 +414,11 @@ struct LaneFfts {
         }
     }
 
+    /** Asks for samples of the next row while this one is at work. */
+    QUO_FFT_INLINE void fetch(const float* from, std::ptrdiff_t floats) {
+        constexpr std::ptrdiff_t kLine = 16;
+        for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(from + k);
+    }
     static void rows(const RowFft& fft, const FftRows& rows, float* room) noexcept {
         const int n1 = fft.second.length(), n2 = fft.first.length();
         float *const tile = room, *const lanes = tile + fft.tile, *const rest = lanes + fft.lanes;
@@ -429,6 +434,7 @@ struct LaneFfts {
                 (fft.packs ? turn_pack<true> : turn_pack<false>)(fft, tile, result, lanes);
                 one_pack(fft.second, {lanes, kSlot, false}, {out + 2 * result, 2 * std::ptrdiff_t{n2}, true},
                          nullptr, rest);
+                if (row + 1 < rows.count) fetch(in + rows.distance + c * kSlot * n1, kSlot * n1);
             }
         }
     }

@@ -72,12 +72,10 @@ private:
 
 }  // namespace
 
-FftEngine* load_own_engine() noexcept try {
+FftEngine* load_own_engine() noexcept {
     // Never destroyed: objects that outlive this file's statics may still use their plans.
-    static OwnEngine& engine = *new OwnEngine;
-    return &engine;
-} catch (...) {
-    return nullptr;  // out of memory
+    static OwnEngine* const engine = new (std::nothrow) OwnEngine;
+    return engine;
 }
 
 }  // namespace quo
