@@ -57,7 +57,7 @@ private:
 
 struct Split {
     double cost = std::numeric_limits<double>::infinity();
-    int second = 0;
+    int second = 1;
 };
 
 int packs_of(int count, int lanes) { return count / lanes + (count % lanes != 0 ? 1 : 0); }
@@ -95,7 +95,10 @@ public:
     Roots(int n, bool forward) {
         const double step = (forward ? -2.0 : 2.0) * std::numbers::pi / n;
         for (int k = 0; k <= kMask; ++k) fine_.push_back({std::cos(step * k), std::sin(step * k)});
-        for (double k = 0.0; k < n; k += kMask + 1) coarse_.push_back({std::cos(step * k), std::sin(step * k)});
+        for (std::int64_t k = 0; k < n; k += kMask + 1) {
+            const double angle = step * static_cast<double>(k);
+            coarse_.push_back({std::cos(angle), std::sin(angle)});
+        }
     }
     FftRoot operator()(std::int64_t e) const {
         const Exact &a = fine_[static_cast<std::size_t>(e & kMask)],
@@ -180,7 +183,7 @@ std::size_t fft_bytes(const FftKind& kind) noexcept {
     return copies * samples + (std::size_t{1} << 19);
 }
 
-FftTables::FftTables(const FftKind& kind) : kind_{kind}, kernels_{*fft_kernels(kind.lanes)} {
+FftTables::FftTables(const FftKind& kind) : kind_{kind}, kernels_{fft_kernels(kind.lanes)} {
     if (kind.way == FftWay::Rows)
         row_ = along_row();
     else
@@ -197,11 +200,11 @@ std::size_t FftTables::room() const noexcept {
 void FftTables::run(const float* in, float* out, std::ptrdiff_t pitch, int count, float* room) const noexcept {
     switch (kind_.way) {
         case FftWay::Columns:
-            return kernels_.columns(lanes_, {in, out, pitch, count}, room);
+            return kernels_->columns(lanes_, {in, out, pitch, count}, room);
         case FftWay::Rows:
-            return kernels_.rows(row_, {in, out, pitch, count}, room);
+            return kernels_->rows(row_, {in, out, pitch, count}, room);
         case FftWay::ShortRows:
-            return kernels_.short_rows(lanes_, {in, out, pitch, count}, room);
+            return kernels_->short_rows(lanes_, {in, out, pitch, count}, room);
     }
 }
 

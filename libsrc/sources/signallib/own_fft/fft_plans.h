@@ -1,10 +1,9 @@
 #ifndef QUO_FFT_PLANS_H
 #define QUO_FFT_PLANS_H
 
-#include <compare>
 #include <cstddef>
 #include <cstdint>
-#include <memory>
+#include <tuple>
 #include <vector>
 
 #include "signallib/fft_engine.h"
@@ -21,7 +20,9 @@ struct FftKind {
     bool forward = true;
     int lanes = 4;
 
-    auto operator<=>(const FftKind&) const = default;
+    friend bool operator<(const FftKind& a, const FftKind& b) {
+        return std::tie(a.way, a.length, a.forward, a.lanes) < std::tie(b.way, b.length, b.forward, b.lanes);
+    }
 };
 
 /** Whether a length has no prime factor above 7. */
@@ -51,7 +52,7 @@ private:
     void turn_lanes(RowFft& row);
 
     FftKind kind_;
-    const FftKernels& kernels_;
+    const FftKernels* kernels_;
     std::vector<std::vector<FftRoot>> roots_;
     std::vector<float> turns_;
     LaneFft lanes_;
