@@ -122,7 +122,8 @@ inline Exact exact_dft(const Exact& x) {
         Exact part;
         for (std::size_t k = j; k < n; k += p) part.push_back(x[k]);
         if (p < n) part = exact_dft(part);
-        for (std::size_t k = 0, e = 0; k < n; ++k, e = (e + j) % n) out[k] += times(part[k % part.size()], roots[e]);
+        for (std::size_t k = 0, e = 0; k < n; ++k, e = (e + j) % n)
+            out[k] += times(part[k % part.size()], roots[e]);
     }
     return out;
 }

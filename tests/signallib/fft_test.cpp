@@ -46,7 +46,7 @@ constexpr int kStep = 1;
 TEST_P(Fft, EveryLengthUpTo2100IsWithinTheBound) { expect_within_bound(2, fast_ ? 2100 : 200, fast_ ? kStep : 5); }
 TEST_P(Fft, LongLengthsAreWithinTheBound) {
     for (const int n : {4099, 5760, 46656, 65598, 65625, 117649, 120050, 1 << 20, 1 << 22})
-        if (fast_ && (kStep == 1 || n < 1 << 20)) expect_within_bound(n, n, 1);
+        if (fast_ && (n < 1 << 20 || (kStep == 1 && *GetParam().name == 'A'))) expect_within_bound(n, n, 1);
 }
 
 /** An image larger than the part that is transformed. */
