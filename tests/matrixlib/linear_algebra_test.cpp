@@ -14,8 +14,8 @@
 #include "one_based.h"
 #include "quo_base/MatrixAlgebraANSI.h"
 #include "quo_base/gr_pt.h"
-#include "support/levels.h"
 #include "support/diagnostics.h"
+#include "support/levels.h"
 
 extern "C" void dgesvd_(const char* jobu, const char* jobvt, const int* m, const int* n, double* a, const int* lda,
                         double* s, double* u, const int* ldu, double* vt, const int* ldvt, double* work,
