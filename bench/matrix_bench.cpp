@@ -119,6 +119,41 @@ void linear_own(benchmark::State& state) {
     state.SetItemsProcessed(state.iterations() * kPoints);
 }
 
+struct GridSystem {
+    GridSystem() {
+        for (int k = 0; k < kPoints; ++k) {
+            double f[8];
+            grid_basis(k, f, 7);
+            design.insert(design.end(), f + 1, f + 8);
+        }
+    }
+    Curve curve;
+    std::vector<double> design;
+};
+
+void orthogonal_own(benchmark::State& state) {
+    const GridSystem system;
+    double x[7];
+    for (auto _ : state) {
+        if (lsq_fit(system.design.data(), kPoints, 7, system.curve.y.data(), x, nullptr) != 0)
+            state.SkipWithError("lsq_fit failed");
+        benchmark::DoNotOptimize(x);
+    }
+    state.SetItemsProcessed(state.iterations() * kPoints);
+}
+
+void orthogonal_eigen(benchmark::State& state) {
+    const GridSystem system;
+    const Eigen::Map<const Eigen::VectorXd> y{system.curve.y.data(), kPoints};
+    using RowMajor = Eigen::Matrix<double, Eigen::Dynamic, 7, Eigen::RowMajor>;
+    for (auto _ : state) {
+        const Eigen::MatrixXd design = Eigen::Map<const RowMajor>{system.design.data(), kPoints, 7};
+        const Eigen::VectorXd x = design.colPivHouseholderQr().solve(y);
+        benchmark::DoNotOptimize(x.data());
+    }
+    state.SetItemsProcessed(state.iterations() * kPoints);
+}
+
 void linear_eigen(benchmark::State& state) {
     const Curve curve;
     for (auto _ : state) {
@@ -135,12 +170,14 @@ void linear_eigen(benchmark::State& state) {
     state.SetItemsProcessed(state.iterations() * kPoints);
 }
 
-BENCHMARK(invert_own)->Arg(3)->Arg(7)->Arg(50)->Arg(200);
-BENCHMARK(invert_lapack)->Arg(3)->Arg(7)->Arg(50)->Arg(200);
+BENCHMARK(invert_own)->Arg(3)->Arg(7)->Arg(50)->Arg(200)->Arg(500);
+BENCHMARK(invert_lapack)->Arg(3)->Arg(7)->Arg(50)->Arg(200)->Arg(500);
 BENCHMARK(polynomial_own);
 BENCHMARK(polynomial_eigen);
 BENCHMARK(linear_own);
 BENCHMARK(linear_eigen);
+BENCHMARK(orthogonal_own);
+BENCHMARK(orthogonal_eigen);
 
 }  // namespace
 
@@ -150,9 +187,11 @@ int main(int argc, char** argv) {
                                   {{"MatInv n=3 / LAPACK", "invert_own/3", "invert_lapack/3", 1.3},
                                    {"MatInv n=7 / LAPACK", "invert_own/7", "invert_lapack/7", 1.3},
                                    {"MatInv n=50 / LAPACK", "invert_own/50", "invert_lapack/50", 1.0},
-                                   {"MatInv n=200 / LAPACK", "invert_own/200", "invert_lapack/200", 1.0},
+                                   {"MatInv n=200 / LAPACK", "invert_own/200", "invert_lapack/200", 0.5},
+                                   {"MatInv n=500 / LAPACK", "invert_own/500", "invert_lapack/500", 0.5},
                                    {"polfit degree 4 / Eigen", "polynomial_own", "polynomial_eigen", 1.0},
-                                   {"lfitd 7 functions / Eigen", "linear_own", "linear_eigen", 1.0}});
+                                   {"lfitd 7 functions / Eigen", "linear_own", "linear_eigen", 1.0},
+                                   {"lsq_fit 7 columns / Eigen", "orthogonal_own", "orthogonal_eigen", 2.0}});
     exit_ckerr();
     return status;
 }

@@ -93,7 +93,7 @@ function(quo_test_headers)
         add_executable(quo_test_headers "${PROJECT_BINARY_DIR}/no_test.cpp")
         target_compile_options(quo_test_headers PRIVATE ${quo_test_level} -Wno-array-bounds -Wno-stringop-overflow)
         target_link_libraries(quo_test_headers PRIVATE quo_flags GTest::gmock)
-        target_precompile_headers(quo_test_headers PRIVATE <gmock/gmock.h> <filesystem> <fstream>)
+        target_precompile_headers(quo_test_headers PRIVATE "${PROJECT_SOURCE_DIR}/tests/support/prelude.h")
     endif()
 endfunction()
 

@@ -1,6 +1,7 @@
 #ifndef QUO_BASE_SARPOLYNOMIALS_H
 #define QUO_BASE_SARPOLYNOMIALS_H
 
+#include <atomic>
 #include <memory>
 #include <string_view>
 
@@ -113,10 +114,12 @@ class QUO_BASE_API extended_polyFR : public extended_poly {};
 /** The polynomials of a product: for each of six quantities a list, ordered by increasing taz0 (nothing sorts it).
  *
  * Selection takes the first polynomial whose taz0 is at or after the azimuth time, which need not be the nearest,
- * or the last one. Interpolation blends the coefficients of the two around the azimuth time, about the reference
- * point of the earlier one; outside the list the Doppler centroid and FM rate go on linearly, the other four stay
- * at the end's coefficients. An empty list gives 10 and the ERROR entry "NO DC poly available" (FR, SL2GR, GR2SL,
- * SL2THETA, SL2PHI likewise), with the output unchanged; the forms that return the value then return 0.
+ * or the last one. What order a long list is in is found at the first evaluation after it was made or read: times
+ * that change later count at once, but must not leave that order. Interpolation blends the coefficients of the two
+ * around the azimuth time, about the reference point of the earlier one; outside the list the Doppler centroid and
+ * FM rate go on linearly, the other four stay at the end's coefficients. An empty list gives 10 and the ERROR
+ * entry "NO DC poly available" (FR, SL2GR, GR2SL, SL2THETA, SL2PHI likewise), with the output unchanged; the forms
+ * that return the value then return 0.
  *
  * Section "PolySAR" holds the counts, and one section per polynomial: "PolySAR/DopplerCentroid-0" and so on, with
  * DopplerRate, SlantToGround, GroundToSlant, SlantToTheta, SlantToPhi for the others. */
@@ -204,10 +207,11 @@ protected:
 private:
     friend struct quo::PolynomialLists;
     struct Made {
-        const void* list;
-        int32_t length;
+        const void* list = nullptr;
+        int32_t length = 0;
+        mutable std::atomic<int32_t> ordered = 0;  // so many first ones do not decrease in time; 0 not known yet
     };
-    Made made_[6] = {};  // by CreatePolys(), in the order of the lists
+    Made made_[6];  // by CreatePolys(), in the order of the lists
 };
 
 #endif

@@ -14,19 +14,21 @@ QUO_BASE_C_BEGIN
  * Direction codes, one per dimension: 0 no transform; +1 forward (exponent sign -1), unscaled; -1 inverse, then
  * divided by the length; -2 inverse, unscaled. A dimension of transform length 1 is skipped.
  *
- * The transforms are computed by an engine that is loaded when the first plan is made. QUO_FFT_ENGINE names it:
- * "mkl" (libmkl_rt; QUO_MKL_LIBRARY may give its file), "fftw" (the module quo_base/libquo_base_fftw.so beside
- * this library; QUO_FFTW_MODULE may give another file) or "auto", which is the default: MKL on processors of its
- * maker, else FFTW, else whichever can be loaded; any other value counts as "auto". Engines run on the caller's
- * thread alone.
+ * The transforms are computed by an engine. QUO_FFT_ENGINE names it: "quo" (kernels of this library, for lengths
+ * without a prime factor above 7), "fftw" (the module quo_base/libquo_base_fftw.so beside this library;
+ * QUO_FFTW_MODULE may give another file), "mkl" (libmkl_rt; QUO_MKL_LIBRARY may give its file) or "auto", which is
+ * the default: for each length the first that takes it of MKL, on processors of its maker only, "quo", FFTW, and
+ * MKL on other processors. Any other value counts as "auto". FFTW and MKL are loaded when the first plan asks for
+ * them. Engines run on the caller's thread alone.
  *
- * Making a plan of a new geometry measures, which takes milliseconds to seconds. What was measured is kept for the
- * process (the 32 geometries used last), so that the same plan made again takes well under 2 microseconds.
- * Planning never touches the caller's buffers.
+ * Making a plan takes microseconds to a few milliseconds and measures nothing, so that every run on one machine
+ * gives the same bits. The tables of a plan are kept for the process (the 32 geometries used last), so that the same
+ * plan made again takes well under 2 microseconds. Planning never touches the caller's buffers. FFTW measures, which
+ * takes up to seconds, where QUO_FFT_PLANNING is "measure".
  *
- * Threads: all functions may be called by any number of threads at a time. Plans are measured one after the other;
- * transforms run side by side, by one plan too, on buffers that do not overlap. A plan is released when no thread
- * runs it any more.
+ * Threads: all functions may be called by any number of threads at a time. Plans of FFTW are made one after the
+ * other; transforms run side by side, by one plan too, on buffers that do not overlap. A plan is released when no
+ * thread runs it any more.
  *
  * Relative error of a forward transform of length N (root of the mean square): at most 2e-7 * log2(N). */
 
@@ -49,10 +51,11 @@ typedef struct FftPlan {
     int column_direction;   /**< +1 forward, -1 inverse, 0 none */
 } FftPlan;
 
-/** Name of the engine, which is loaded if none is yet: "mkl", "fftw", or "none" where neither can be loaded. */
+/** Name of the engine for lengths without a prime factor above 7, which is loaded if it is not yet: "quo", "fftw",
+ * "mkl", or "none" where the one that QUO_FFT_ENGINE names cannot be loaded. */
 QUO_BASE_API const char* fft_engine_name(void) QUO_NOEXCEPT;
 
-/** Why the engine failed on this thread: no engine can be loaded, memory is too short, or what the engine's
+/** Why the engine failed on this thread: none can be loaded that takes the length, memory is too short, or what the engine's
  * library answered. Statuses 4, 5 and 7 of the functions below leave it, but for a chirp-z transform that finds no
  * memory of its own (7); making the next plan empties it. Nothing of the kind goes into the report.
  * @return the text, empty where there is none; never null, and valid until this thread's next call of this header
@@ -72,8 +75,9 @@ QUO_BASE_API const char* fft_engine_error(void) QUO_NOEXCEPT;
  * @return 0; 1 for a null plan, n < 1, m < 1 or an image that no address space holds; 2 for nfft outside 1..n; 3
  * for mfft outside 1..m; 4 when the row transforms cannot be had (unknown direction, no memory, no engine); 5 when
  * the column transforms cannot be had, in which case nothing is left of the rows'. fft_engine_error() tells the
- * cause where it lies with the engine. Memory that the engine may take is looked for before it starts: some five
- * times the transform, ten times with prime factors above 13, and up to 100 MiB more. */
+ * cause where it lies with the engine. Memory that the engine may take is looked for before it starts: twice a row of
+ * more than 65536 samples with "quo", four times a shorter one and up to 65 columns; with the others some five times
+ * the transform, ten times with prime factors above 13, and up to 100 MiB more. */
 QUO_BASE_API int fft_makep_c(FftPlan* plan, int n, int nfft, int m, int mfft, int dir_rows, int dir_cols,
                              int in_place) QUO_NOEXCEPT;
 

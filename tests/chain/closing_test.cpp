@@ -1,10 +1,4 @@
-#include <gmock/gmock.h>
-
-#include <cmath>
-#include <complex>
 #include <regex>
-#include <string>
-#include <vector>
 
 #include "common/session.h"
 #include "common/targets.h"

@@ -1,11 +1,3 @@
-#include <gtest/gtest.h>
-
-#include <cerrno>
-#include <random>
-#include <string>
-#include <tuple>
-#include <vector>
-
 #include "quo_base/datafile.h"
 #include "support/diagnostics.h"
 
@@ -115,13 +107,8 @@ TEST_P(RandomWalk, SeesWhatAPlainFileGives) {
     EXPECT_EQ(errno, 0);
 }
 const auto kSizes = testing::Values(0, 1, 2, 3, 7, 16, 33, 400);
-std::string walk_name(const testing::TestParamInfo<RandomWalk::ParamType>& row) {
-    const auto [mode, size, keep] = row.param;
-    return "Mode" + std::to_string(mode) + "Size" + std::to_string(size) + "Keep" + std::to_string(keep);
-}
 INSTANTIATE_TEST_SUITE_P(Reading, RandomWalk,
-                         testing::Combine(testing::Values(1), kSizes, testing::Values(0, 1, 5, 100)), walk_name);
-INSTANTIATE_TEST_SUITE_P(Writing, RandomWalk, testing::Combine(testing::Values(2, 3), kSizes, testing::Values(0)),
-                         walk_name);
+                         testing::Combine(testing::Values(1), kSizes, testing::Values(0, 1, 5, 100)));
+INSTANTIATE_TEST_SUITE_P(Writing, RandomWalk, testing::Combine(testing::Values(2, 3), kSizes, testing::Values(0)));
 
 }  // namespace

@@ -1,18 +1,9 @@
 // Every pair of cell type and memory type, in rasters of different layouts, against the rules told one by one.
-#include <gtest/gtest.h>
 
-#include <cmath>
-#include <cstdint>
-#include <cstring>
-#include <limits>
-#include <ostream>
-#include <string>
-#include <type_traits>
-#include <utility>
-#include <vector>
-
+#include "datafilelib/kernel_table.h"
 #include "quo_base/datafile.h"
 #include "support/diagnostics.h"
+#include "support/levels.h"
 #include "support/raster.h"
 
 namespace {
@@ -39,10 +30,8 @@ constexpr Layout kLayouts[] = {{"LittleEndian", 0, 0, 0, 0},
                                {"LittleEndianLargePrefix", 0, 6000, 7, 0},
                                {"BigEndianHeaderBuffered", 1, 17, 101, 64}};
 
-bool complex_type(int type) { return type % 2 == 0; }
-
 void append_sample(std::string& text, int type, int line, int sample, bool pairs, bool big) {
-    for (int part = 0; part <= (complex_type(type) ? 1 : 0); ++part)
+    for (int part = 0; part <= (quo::is_complex_type(type) ? 1 : 0); ++part)
         test::append_part(text, type, part == 1 && !pairs ? 0.0 : test::part_value(line, sample, part), big);
 }
 /** A raster with the samples of a cut, of real values where `pairs` is false, and dots elsewhere. */
@@ -110,8 +99,9 @@ TEST_P(EveryPair, IsMovedByRegionsAsTold) {
     for (const Access& access : kAccesses)
         for (int type = 0; type <= INT8; ++type) {
             SCOPED_TRACE(testing::Message() << "file " << type << ", memory " << access.memory);
-            const bool refused = type > INT16 || access.memory > INT16, pairs = complex_type(access.memory);
-            const std::string wanted = packed(access.memory, kPart, complex_type(type), kWidth);
+            const bool refused = type > INT16 || access.memory > INT16,
+                       pairs = quo::is_complex_type(access.memory);
+            const std::string wanted = packed(access.memory, kPart, quo::is_complex_type(type), kWidth);
             std::string memory(wanted.size(), 'U');
             DataFile file;
             file.setFilename(name_.c_str());
@@ -209,63 +199,60 @@ TEST_P(EveryPair, HasSingleSamplesOfItsOwnTypeInTheHostsOrder) {
 }
 INSTANTIATE_TEST_SUITE_P(Layouts, EveryPair, testing::ValuesIn(kLayouts), testing::PrintToStringParamName());
 
-struct Rounding {
-    double value;
-    int from_double, from_float, to_short;
-};
-constexpr double kInfinity = std::numeric_limits<double>::infinity();
-// Single precision has bounds of its own: the largest float below 2^31.
-constexpr int kMax = 2147483647, kMin = -kMax - 1, kMaxFloat = 2147483520;
-constexpr Rounding kRounding[] = {{2.5, 3, 3, 3},
-                                  {-2.5, -3, -3, -3},
-                                  {0.49999997, 0, 0, 0},
-                                  {0.0, 0, 0, 0},
-                                  {32767.5, 32768, 32768, 32767},
-                                  {-32768.5, -32769, -32769, -32768},
-                                  {8388607.5, 8388608, 8388608, 32767},
-                                  {2147483520.0, 2147483520, kMaxFloat, 32767},
-                                  {2147483648.0, kMax, kMaxFloat, 32767},
-                                  {-2147483648.0, kMin, kMin, -32768},
-                                  {kInfinity, kMax, kMaxFloat, 32767},
-                                  {-kInfinity, kMin, kMin, -32768},
-                                  {std::numeric_limits<double>::quiet_NaN(), 0, 0, 0}};
-
-/** Values through a file of one type: written as they are, read back as another type. */
-template <typename Out, typename In>
-std::vector<Out> through(const std::string& name, int cell_type, const std::vector<In>& values) {
-    BufferFile file{name.c_str()};
-    file.NrOfLinesPerImage = 1;
-    file.NrOfPixelsPerLine = static_cast<int>(values.size());
-    file.CellType = cell_type;
-    file.open(BufferFile::WRITE);
-    file.writebuffer(values.data(), 0, 1, 0, 0);
-    std::vector<Out> back(values.size(), Out{77});
-    file.readbuffer(back.data(), 0, 1, 0, 0);
-    EXPECT_EQ(back[0], Out{77}) << "a file that is only written";
-    file.open(BufferFile::READ);
-    file.readbuffer(back.data(), 0, 1, 0, 0);
-    return back;
+/** The rule told plainly. Single precision has a bound of its own: the largest float below 2^31. */
+template <typename To, typename From>
+To rounded(From number) {
+    constexpr double high = sizeof(To) == 4 && sizeof(From) == 4 ? 2147483520.0 : std::numeric_limits<To>::max();
+    return std::isnan(number)
+               ? To{0}
+               : static_cast<To>(std::clamp<double>(std::round(number), std::numeric_limits<To>::min(), high));
+}
+template <typename From, typename To>
+void expect_rounding(int real, To) {
+    constexpr int integer = sizeof(To) == 4 ? INT32 : sizeof(To) == 2 ? INT16 : INT8;
+    std::vector<From> numbers;
+    for (const double edge :
+         {0.0, 0.49999997, 2.5, 126.5, 127.5, 32766.5, 32767.5, 32768.5, 8388607.5, 2147483520.0, 2147483646.5,
+          2147483647.5, 2147483648.0, 4294967296.0, HUGE_VAL, std::nan("")}) {
+        const auto at = static_cast<From>(edge), above = std::nextafter(at, static_cast<From>(HUGE_VAL)),
+                   below = std::nextafter(at, From{0});
+        numbers.insert(numbers.end(), {at, above, below, -at, -above, -below});
+    }
+    std::mt19937_64 random{17};
+    for (int i = 0; i < 9000; ++i)
+        numbers.push_back(static_cast<From>(std::ldexp(int64_t(random()), -int(random() % 70))));
+    std::vector<To> wanted, found(numbers.size());
+    for (const From number : numbers) wanted.push_back(rounded<To>(number));
+    for (const auto level : test::processor_levels()) {
+        const auto& kernels = quo::kernel_table(level).kernels;
+        // Access 4 reads whatever there is, and 3 writes blocks, though none of bytes.
+        for (const auto kernel : {kernels[4][integer][real], kernels[3][real][integer]}) {
+            if (kernel) kernel(numbers.data(), found.data(), numbers.size(), false);
+            EXPECT_EQ(found, wanted) << real << " to " << integer << ", level " << static_cast<int>(level);
+        }
+    }
+}
+TEST(Rounding, IsHalfAwayFromZeroHeldAtTheBoundsAtEveryWidth) {
+    const auto into = [](auto... to) {
+        ((expect_rounding<float>(FLOAT32, to), expect_rounding<double>(FLOAT64, to)), ...);
+    };
+    into(std::int32_t{}, std::int16_t{}, std::int8_t{});
 }
 
-// Reading rounds where the file holds real numbers, writing where it holds integers.
-TEST(BlockRounding, IsHalfAwayFromZeroHeldAtTheBounds) {
-    const test::TemporaryFolder folder;
-    const std::string name = folder.file("values");
-    std::vector<double> doubles;
-    std::vector<float> floats;
-    std::vector<int> from_double, from_float;
-    std::vector<short> shorts;
-    for (const auto& [value, of_double, of_float, of_both] : kRounding) {
-        doubles.push_back(value);
-        floats.push_back(static_cast<float>(value));
-        from_double.push_back(of_double);
-        from_float.push_back(of_float);
-        shorts.push_back(static_cast<short>(of_both));
+TEST(Kernels, GiveTheSameBytesAtEveryWidth) {
+    std::mt19937 random{17};
+    std::string in(77 * 16 + 1, ' ');  // at odd addresses, and no whole number of vectors
+    std::ranges::generate(in, [&] { return static_cast<char>(random()); });
+    for (int pair = 0; pair < 5 * 10 * 10 * 2; ++pair) {
+        std::string first;
+        for (const auto level : test::processor_levels()) {
+            const auto kernel = quo::kernel_table(level).kernels[pair / 200][pair / 20 % 10][pair / 2 % 10];
+            std::string out = in;
+            if (kernel) kernel(in.data() + 1, out.data(), 77, pair % 2 == 1);
+            EXPECT_TRUE(out == (level == quo::ProcessorLevel::kBase ? first = out : first))
+                << pair << ", level " << static_cast<int>(level);
+        }
     }
-    for (const int type : {FLOAT64, INT32}) EXPECT_EQ((through<int>(name, type, doubles)), from_double);
-    for (const int type : {FLOAT64, INT16}) EXPECT_EQ((through<short>(name, type, doubles)), shorts);
-    for (const int type : {FLOAT32, INT32}) EXPECT_EQ((through<int>(name, type, floats)), from_float);
-    for (const int type : {FLOAT32, INT16}) EXPECT_EQ((through<short>(name, type, floats)), shorts);
 }
 
 // Lines with room for the pairs keep their place; others grow, so that no sample is lost.

@@ -1,19 +1,6 @@
 // Runs the sessions of data/rasters/sessions.txt.
 #include "support/session.h"
 
-#include <gtest/gtest.h>
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <algorithm>
-#include <cerrno>
-#include <csignal>
-#include <filesystem>
-#include <functional>
-#include <map>
-#include <optional>
-#include <string>
-
 #include "quo_base/datafile.h"
 #include "support/limits.h"
 
@@ -118,6 +105,11 @@ protected:
             {"b.close", [&] { return buffer_.close(), buffer_.is_open() ? 1 : 0; }},
             {"b.read", [&] { return tell(n(1), [&](char* to) { return buffer_.read(to, n(1)); }); }},
             {"b.write", [&] { return buffer_.write(from, size()); }},
+            {"b.copyFrom",
+             [&] {
+                 BufferFile source{name};
+                 return source.open(1), 10 * buffer_.copyFrom(source, n(2)) + source.status();
+             }},
             {"b.seek", [&] { return buffer_.seek(n(1), n(2)), buffer_.tell(); }},
             {"b.tell", [&] { return buffer_.tell(); }},
             {"b.status", [&] { return buffer_.status(); }},

@@ -1,14 +1,5 @@
 #include "quo_base/debugIO.h"
 
-#include <gtest/gtest.h>
-#include <unistd.h>
-
-#include <cerrno>
-#include <cstdint>
-#include <cstdio>
-#include <limits>
-#include <string>
-
 #include "support/diagnostics.h"
 
 namespace {

@@ -1,14 +1,4 @@
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <array>
-#include <cmath>
-#include <fstream>
-#include <limits>
 #include <nlohmann/json.hpp>
-#include <string>
-#include <utility>
 
 #include "quo_base/SARpolynomials.h"
 #include "quo_base/generalSARorbit.h"

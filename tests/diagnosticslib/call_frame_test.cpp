@@ -1,15 +1,6 @@
 #include "diagnosticslib/call_frame.h"
 
-#include <gmock/gmock.h>
 #include <sys/mman.h>
-#include <unistd.h>
-
-#include <cerrno>
-#include <cstring>
-#include <functional>
-#include <string>
-#include <utility>
-#include <vector>
 
 #include "tracking.h"
 

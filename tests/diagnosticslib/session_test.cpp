@@ -1,17 +1,7 @@
 // Runs the sessions of data/diagnostics/sessions.txt.
 #include "support/session.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <cerrno>
-#include <cstdlib>
 #include <ctime>
-#include <filesystem>
-#include <functional>
-#include <map>
-#include <string>
-#include <vector>
 
 #include "quo_base/ckerr.h"
 #include "quo_base/quorelReport.h"

@@ -1,18 +1,3 @@
-#include <gmock/gmock.h>
-
-#include <algorithm>
-#include <array>
-#include <cerrno>
-#include <climits>
-#include <cstdint>
-#include <cstring>
-#include <functional>
-#include <map>
-#include <random>
-#include <string>
-#include <utility>
-#include <vector>
-
 #include "tracking.h"
 
 // Requests beyond all memory are refused with null under the address sanitizer too, as by the system.

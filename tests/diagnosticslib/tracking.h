@@ -1,12 +1,6 @@
 #ifndef QUO_TESTS_TRACKING_H
 #define QUO_TESTS_TRACKING_H
 
-#include <gtest/gtest.h>
-
-#include <cerrno>
-#include <string>
-#include <vector>
-
 #include "quo_base/ckerr.h"
 #include "support/diagnostics.h"
 

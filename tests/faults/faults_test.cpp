@@ -1,19 +1,6 @@
 #include "support/faults.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
 #include <sys/mman.h>
-#include <sys/stat.h>
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <cerrno>
-#include <csignal>
-#include <cstdlib>
-#include <cstring>
-#include <filesystem>
-#include <map>
-#include <random>
 
 #include "faults/jobs.h"
 #include "quo_base/ckerr.h"

@@ -1,12 +1,5 @@
 #include "faults/jobs.h"
 
-#include <array>
-#include <cmath>
-#include <cstdlib>
-#include <filesystem>
-#include <memory>
-#include <ostream>
-
 #include "objects/records.h"
 #include "quo_base/Coregist.h"
 #include "quo_base/MatrixAlgebraANSI.h"

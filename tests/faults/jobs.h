@@ -1,9 +1,7 @@
 #ifndef QUO_TESTS_FAULTS_JOBS_H
 #define QUO_TESTS_FAULTS_JOBS_H
 
-#include <functional>
-#include <string>
-#include <vector>
+#include "support/prelude.h"
 
 namespace test {
 

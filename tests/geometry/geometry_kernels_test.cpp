@@ -1,10 +1,7 @@
 #include "sarutillib/geometry/geometry_kernels.h"
 
-#include <gtest/gtest.h>
-
-#include <cmath>
-
 #include "support/geometry.h"
+#include "support/prelude.h"
 
 namespace {
 

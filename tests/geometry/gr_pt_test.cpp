@@ -1,12 +1,5 @@
 #include "quo_base/gr_pt.h"
 
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <cmath>
-#include <limits>
-#include <random>
-
 #include "quo_base/geometry.h"
 #include "support/diagnostics.h"
 #include "support/geometry.h"

@@ -1,12 +1,9 @@
 #ifndef QUO_TESTS_ORBIT_FIT_H
 #define QUO_TESTS_ORBIT_FIT_H
 
-#include <gtest/gtest.h>
-
-#include <vector>
-
 #include "quo_base/interp_orb.h"
 #include "support/geometry.h"
+#include "support/prelude.h"
 
 namespace test {
 

@@ -1,10 +1,3 @@
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <cmath>
-#include <limits>
-#include <vector>
-
 #include "orbit_fit.h"
 #include "quo_base/gr_pt.h"
 #include "support/diagnostics.h"

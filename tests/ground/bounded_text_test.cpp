@@ -1,11 +1,6 @@
 #include "sarutillib/ground/bounded_text.h"
 
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <cerrno>
-#include <string>
-#include <utility>
+#include "support/prelude.h"
 
 namespace {
 

@@ -1,8 +1,6 @@
 #include "sarutillib/ground/checked_size.h"
 
-#include <gtest/gtest.h>
-
-#include <cstdint>
+#include "support/prelude.h"
 
 namespace {
 

@@ -1,18 +1,6 @@
 #include "sarutillib/ground/file_io.h"
 
-#include <gmock/gmock.h>
 #include <grp.h>
-#include <gtest/gtest.h>
-#include <sys/stat.h>
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <cerrno>
-#include <cstdint>
-#include <filesystem>
-#include <limits>
-#include <string>
-#include <utility>
 
 #include "support/diagnostics.h"
 #include "support/limits.h"

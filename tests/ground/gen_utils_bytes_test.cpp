@@ -1,14 +1,5 @@
-#include <gtest/gtest.h>
-#include <unistd.h>
-
-#include <algorithm>
-#include <bit>
-#include <cstdint>
-#include <numeric>
-#include <string>
-#include <vector>
-
 #include "quo_base/gen_utils.h"
+#include "support/prelude.h"
 
 namespace {
 

@@ -1,22 +1,9 @@
-#include <gtest/gtest.h>
-#include <sys/stat.h>
-#include <unistd.h>
-
-#include <cerrno>
-#include <cstdint>
-#include <cstdio>
-#include <filesystem>
-#include <fstream>
-#include <string>
-#include <utility>
-
 #include "quo_base/gen_utils.h"
 #include "sarutillib/ground/file_io.h"
 #include "support/diagnostics.h"
 
 namespace {
 
-using test::read_text;
 using test::TemporaryFolder;
 using test::write_text;
 
@@ -65,40 +52,6 @@ TEST(Seek, CountsFromStartPositionAndEndAndRefusesWhatLeadsNowhere) {
     const quo::Stream in{fdopen(ends[0], "rb")}, out{fdopen(ends[1], "wb")};
     for (const int whence : {0, 1, 2}) EXPECT_EQ(myfseek64_msc(in.get(), 0, whence), -1);
     errno = 0;
-}
-
-// Of a path with slashes, backslashes belong to the name.
-TEST(Paths, LoseOneSeparatorAndShowTheirName) {
-    constexpr struct {
-        const char *path, *without_separator, *name;
-        int length;
-    } kPaths[] = {{"dir\\", "dir", "", 4},         {"dir//", "dir/", "", 5}, {"dir", "dir", "dir", 3},
-                  {"a/b\\c", "a/b\\c", "b\\c", 5}, {"", "", "", 0},          {"a\\b.xml", "a\\b.xml", "b.xml", 7}};
-    for (const auto& row : kPaths) {
-        std::string path = row.path;
-        EXPECT_STREQ(getFileNameFromPath(row.path), row.name);
-        EXPECT_EQ(check_fsep(path.data()), row.length);
-        EXPECT_STREQ(path.c_str(), row.without_separator);
-    }
-}
-
-TEST(CopyParameterFile, CopiesEveryByteOrKeepsTheDestinationAndSaysNothing) {
-    const TemporaryFolder folder;
-    const std::string content(70001, '\xA0');
-    write_text(folder.file("source"), content);
-    write_text(folder.file("old"), content + "longer than the source");
-    mkfifo(folder.file("pipe").c_str(), 0600);
-    test::CapturedStderr captured;
-    for (const auto& [source, destination] : {std::pair{"source", "old"},
-                                              {"old", "new"},
-                                              {"missing", "old"},
-                                              {"", "old"},
-                                              {"pipe", "old"},
-                                              {"old", "no_folder/copy"}})
-        EXPECT_EQ(copyParameterFile(folder.file(source).c_str(), folder.file(destination).c_str()), 0);
-    EXPECT_EQ(copyParameterFile(nullptr, nullptr) + errno, 0);
-    EXPECT_EQ(captured.text(), "");
-    EXPECT_TRUE(read_text(folder.file("old")) == content && read_text(folder.file("new")) == content);
 }
 
 }  // namespace

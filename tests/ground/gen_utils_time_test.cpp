@@ -1,23 +1,11 @@
-#include <gtest/gtest.h>
-
-#include <array>
 #include <chrono>
-#include <cmath>
-#include <cstdio>
-#include <limits>
-#include <random>
-#include <sstream>
-#include <string>
-#include <utility>
 
 #include "quo_base/gen_utils.h"
-#include "sarutillib/ground/gen_utils_dates.h"
 #include "support/diagnostics.h"
 
 namespace {
 
 namespace chr = std::chrono;
-using test::CapturedStderr;
 
 constexpr double kDay = 86400.0, kInfinity = std::numeric_limits<double>::infinity(), kYear2000 = 473299200.0;
 constexpr auto kEpoch = chr::sys_days{chr::year{1985} / 1 / 1};
@@ -97,21 +85,6 @@ TEST(Time, FollowsTheCalendar) {
         ASSERT_EQ(ascii2sec85(("29-DEC-" + std::to_string(year)).c_str()), sec85_of(chr::year{year} / 12 / 29));
 }
 
-TEST(Time, RefusesWhatTheTextCannotHold) {
-    for (const double t : {-1e-9, -kInfinity, sec85_of(kEndOfText), kInfinity, std::nan("")}) {
-        const std::string message =
-            t < 0.0 ? "Date should be later than 1-JAN-1985\n" : "Date should be earlier than 1-JAN-10000\n";
-        std::string text(28, '#');
-        CapturedStderr captured;
-        EXPECT_EQ(sec852myascii(t, text.data()), -1);
-        EXPECT_EQ(text, std::string(28, '#'));
-        sec852ascii(t, text.data());
-        EXPECT_EQ(text, std::string(27, ' ') + '#');
-        EXPECT_EQ(captured.text(), message + message);
-    }
-    EXPECT_EQ(date_text(sec85_of(kEndOfText) - 0.25), "31-DEC-9999 23:59:59.750000");
-}
-
 TEST(MjdRecord, ComesBackToTheMicrosecond) {
     std::mt19937_64 random{2000};
     for (int i = 0; i < 20000; ++i) {
@@ -128,63 +101,6 @@ TEST(MjdRecord, ComesBackToTheMicrosecond) {
     for (int days = 1; days < 40000; ++days)
         ASSERT_EQ(record_text(std::nextafter(kYear2000 + days * kDay, 0.0)),
                   std::to_string(days - 1) + " 86399 999999");
-}
-
-/** What date2str makes of a text: its fields, or its code when it refuses and keeps its hands off the output. */
-std::string parsed(const std::string& text) {
-    DateFields f{-7, -7, -7, -7, -7, -7, -7.0};
-    const int code = date2str(text.c_str(), &f);
-    std::ostringstream shown;
-    shown << f.year << '-' << f.month << " day " << f.day_of_year << ' ' << f.hour << ':' << f.minute << ':'
-          << f.second << " + " << f.fraction;
-    EXPECT_TRUE(code == 0 || shown.str() == "-7--7 day -7 -7:-7:-7 + -7") << text;
-    return code == 0 ? shown.str() : std::to_string(code);
-}
-
-// Looked for in 40 characters: from the 41st on everything is taken as it stands.
-TEST(DateText, IsTakenApartOrRefusedWithItsFlags) {
-    const std::string forty(40, '.');
-    using Row = std::pair<std::string, std::string>;
-    for (const auto& [text, outcome] :
-         {Row{"Start = 3-jul-2004 7:05", "2004-7 day 185 7:5:0 + 0"}, Row{"1-JAN-1985", "1985-1 day 1 0:0:0 + 0"},
-          Row{"29-Feb-2000 24:60:60.5", "2000-2 day 60 24:60:60 + 0.5"},
-          Row{"0-MAR-2001", "2001-3 day 59 0:0:0 + 0"}, Row{"31-DEC-1988 00:00:1e1", "1988-12 day 366 0:0:10 + 0"},
-          // No hyphen after the third letter: the year is not read.
-          Row{"12-APRIL-2001", "0-4 day 103 0:0:0 + 0"}, Row{forty + "1-MAY-1991", "1991-5 day 121 0:0:0 + 0"},
-          Row{"29-FEB-1900", "1"}, Row{"31-APR-2001", "1"}, Row{"12-APR-2001 25:00:00", "16"},
-          Row{"12-APR-2001 -1:00:00", "16"}, Row{"12-APR--99", "256"}, Row{"31-XYZ-2001 10:61:00", "4096"},
-          Row{"12", "4096"}, Row{"12-APR-2001 10:20:61", "65536"}, Row{"12-APR-2001 10:20:-0.5", "65536"},
-          Row{"12-APR-2001 10:20:nan", "65536"}, Row{"32-APR--99 25:61:61", "69905"},
-          Row{forty + ".1-MAY-1991", "4096"}, Row{forty, "4096"}, Row{std::string(39, '.'), "-1"}})
-        EXPECT_EQ(parsed(text), outcome) << text;
-}
-
-TEST(DateDifference, IsSignedAndPassesTheFirstErrorOn) {
-    double seconds = 17.3;
-    EXPECT_EQ(quo::date_difference_seconds("3-JUL-2004 20:53:38.25", "3-JUL-2004 20:53:56.75", &seconds), 0);
-    EXPECT_EQ(quo::date_difference_seconds("32-JUL-2004", "1-XYZ-2004", &seconds), 0x1);
-    EXPECT_EQ(quo::date_difference_seconds("1-JUL-2004", "1-XYZ-2004", &seconds), 0x1000);
-    EXPECT_EQ(seconds, -18.5);
-    CapturedStderr captured;
-    EXPECT_EQ(ascii2sec85("31-XYZ-2001") + ascii2sec85(nullptr), 0.0);
-    EXPECT_EQ(captured.text(), "Error: incorrect date format, code 4096\nError: incorrect date format, code -1\n");
-    // Without any check.
-    EXPECT_NEAR(utc_ch2num("03-JUL-2004 20:53:38.232"), 20040703205338.232, 0.004);
-    EXPECT_NEAR(utc_ch2num("99-JAN-1985 99:99:99.5"), 19850199999999.005, 0.004);
-    EXPECT_EQ(utc_ch2num(""), 13e8);
-}
-
-TEST(CompareWithoutCase, FoldsAsciiLettersOnly) {
-    const struct {
-        const char *a, *b;
-        int difference;
-    } rows[] = {
-        {"DescendING", "dESCENDing", 0}, {"abcd", "ABC", 'd'}, {"@", "`", '@' - '`'}, {"[", "{", '[' - '{'},
-        {"\xC4", "\xE4", 0xC4 - 0xE4},   {nullptr, "", 0},     {nullptr, "A", -'a'}};
-    for (const auto& [a, b, difference] : rows) {
-        EXPECT_EQ(mystrcasecmp(a, b), difference);
-        EXPECT_EQ(mystrcasecmp(b, a), -difference);
-    }
 }
 
 }  // namespace

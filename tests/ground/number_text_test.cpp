@@ -1,18 +1,6 @@
 #include "sarutillib/ground/number_text.h"
 
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <array>
-#include <bit>
-#include <cerrno>
-#include <cmath>
-#include <cstdio>
-#include <cstdlib>
-#include <limits>
-#include <random>
-#include <string>
-#include <vector>
+#include "support/prelude.h"
 
 namespace {
 

@@ -2,7 +2,6 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <cerrno>
 #include <cmath>
 #include <functional>
 #include <limits>
@@ -11,16 +10,16 @@
 #include <string>
 #include <vector>
 
+#include "matrixlib/dense_kernels.h"
 #include "one_based.h"
 #include "quo_base/MatrixAlgebraANSI.h"
 #include "quo_base/gr_pt.h"
 #include "support/diagnostics.h"
+#include "support/levels.h"
 
 extern "C" void dgesvd_(const char* jobu, const char* jobvt, const int* m, const int* n, double* a, const int* lda,
                         double* s, double* u, const int* ldu, double* vt, const int* ldvt, double* work,
                         const int* lwork, int* info);
-extern "C" void dgesv_(const int* n, const int* nrhs, double* a, const int* lda, int* ipiv, double* b,
-                       const int* ldb, int* info);
 
 namespace {
 
@@ -61,12 +60,11 @@ constexpr struct {
     // The last column is the sum of the others, to rounding.
     {"dependent",
      [](int n) {
-         return changed(n, [n](double& a, int, int j) {
-             if (j > 0 && j == n - 1) a = std::accumulate(&a - j, &a, 0.0);
-         });
+         return changed(
+             n, [n](double& a, int, int j) { a = j > 0 && j == n - 1 ? std::accumulate(&a - j, &a, 0.0) : a; });
      }},
 };
-constexpr int kSizes[] = {1, 2, 3, 7, 20, 61, 200};
+constexpr int kSizes[] = {1, 2, 3, 7, 20, 67, 200};  // the last two are halved, in odd parts and even ones
 
 double norm(const Flat& v) {
     double sum = 0.0;
@@ -124,16 +122,6 @@ Flat solve_pivoted_qr(const Flat& a, const Flat& b) {
     const int n = static_cast<int>(b.size());
     return lsq_fit(a.data(), n, n, b.data(), x.data(), &summary) == 0 ? x : Flat{};
 }
-Flat solve_lapack(Flat a, Flat b) {
-    const int n = static_cast<int>(b.size()), one = 1;
-    a = transposed(a, n, n);
-    std::vector<int> pivots(b.size());
-    int info = 0;
-    dgesv_(&n, &one, a.data(), &n, pivots.data(), b.data(), &n, &info);
-    errno = 0;  // whatever an installed LAPACK left there
-    return b;
-}
-
 /** Solves a x = b in one of the library's ways; empty when it answers 10. */
 struct SolverRow {
     const char* name;
@@ -145,8 +133,8 @@ constexpr SolverRow kSolvers[] = {
 class Solvers : public testing::TestWithParam<SolverRow> {};
 
 // The backward error does not suffer from a bad condition: a wrong exchange, a missed element or a wrong sign
-// does. On well-conditioned matrices the solution itself must agree with an independent solver's.
-TEST_P(Solvers, HaveSmallBackwardErrorsAndAgreeWithLapack) {
+// does.
+TEST_P(Solvers, HaveSmallBackwardErrors) {
     const test::Report report;
     for (const auto& matrix : kMatrices) {
         for (const int n : kSizes) {
@@ -156,12 +144,6 @@ TEST_P(Solvers, HaveSmallBackwardErrorsAndAgreeWithLapack) {
             if (x.empty() && &matrix == &kMatrices[3]) continue;  // singular to the last bit
             ASSERT_EQ(x.size(), b.size());
             EXPECT_LE(distance(product(a, x, n, n, 1), b), 10.0 * n * kEpsilon * norm(a) * norm(x));
-
-            Flat heavy = a;
-            for (int i = 0; i < n; ++i) heavy[at(n, i, i)] += 2.0 * n;
-            const Flat close = GetParam().solve(heavy, b), expected = solve_lapack(heavy, b);
-            for (std::size_t i = 0; i < b.size(); ++i)
-                EXPECT_NEAR(close[i], expected[i], 50.0 * kEpsilon * norm(b));
         }
     }
     EXPECT_TRUE(report.entries().empty());
@@ -256,6 +238,25 @@ TEST(Inversion, TimesTheMatrixIsTheIdentity) {
     test::fail_every_allocation([&] { return InvMatrix(a.get(), y.get(), 2); });
     EXPECT_EQ(y.flat(), (Flat{-0.5, 1.0, 0.5, 0.0}));
     EXPECT_EQ(a.flat(), (Flat{1, 1, 0, 2})) << "the factors";
+}
+
+TEST(DenseKernels, GiveTheSameBitsAtEveryWidth) {
+    Flat first;
+    for (const auto level : test::processor_levels()) {
+        const quo::DenseKernels& kernels = quo::dense_kernels(level);
+        Flat a = random_matrix(60), found(1046);
+        const double *const u = &a[2600], *const factors[] = {u, u + 100, u + 200, u + 300};
+        double *const sums = &found[1034], *const rows[] = {&a[0], &a[600], &a[1200], &a[1800]};
+        const quo::Columns columns{rows[0], 517, 5, 517};
+        kernels.dots(u, columns, sums);
+        kernels.subtract_multiples(u, sums, columns, sums + 5);
+        kernels.long_residual(columns, sums, u, u + 1, &found[0], &found[517]);
+        sums[10] = kernels.long_dot(u, rows[0], 517);
+        sums[11] = kernels.largest(u, 517);
+        kernels.subtract_tile(rows, factors, Flat(30 * 16, 0.3).data(), 30);
+        for (const double* row : rows) found.insert(found.end(), row, row + 4);
+        EXPECT_EQ(found, level == quo::ProcessorLevel::kBase ? first = found : first) << static_cast<int>(level);
+    }
 }
 
 TEST(SingularMatrices, HaveTheirMessages) {

@@ -1,12 +1,5 @@
 #include "quo_base/Coregist.h"
 
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <cmath>
-#include <string>
-#include <vector>
-
 #include "support/diagnostics.h"
 
 namespace {
@@ -82,27 +75,6 @@ TEST_P(Mappings, HaveASampleFormThatSaysTheSame) {
     slave.SlowTimeDelta = master.SlowTimeDelta;
     ASSERT_EQ(fit_.Time2Samples(5.351e-3, 803450.1, 5.349e-3, 11.5, 1.57e-8, 2.05e-3), 0);
     expect_agreement();
-}
-
-TEST(Coregist, RefusesWhatHasNoInverse) {
-    const test::Report report;
-    Coregist fit;  // all zero
-    double range = 5.0, azimuth = 6.0;
-    EXPECT_EQ(fit.evaluateMAtime(1.0, 1.0, &range, &azimuth), 10);
-    fit.RgFit[0] = -1.0;  // a parabola that never reaches the time
-    fit.RgFit[1] = 0.1;
-    fit.AzFit[2] = 1.0;
-    fit.init();
-    EXPECT_EQ(fit.evaluateMAtime(1.0, 1.0, &range, &azimuth), 10);
-    EXPECT_EQ(10.0 * range + azimuth, 56.0);
-    EXPECT_TRUE(std::isnan(fit.evaluateMAtimeRange(1.0, 1.0)));
-    ROI_Obj empty;
-    EXPECT_EQ(fit.Time2Samples(&empty, &empty) + fit.Time2Samples(nullptr, &empty), 2);
-    EXPECT_EQ(fit.ConvertPolys(&empty, &empty) + fit.ConvertPolys(&empty, nullptr), 2);
-    EXPECT_EQ(fit.readpar(report.file("missing.xml").c_str()), 1);
-    const std::vector<std::string> messages = report.messages("ERROR");
-    EXPECT_EQ(std::ranges::count(messages, "The mapping has no inverse there"), 3);
-    EXPECT_EQ(messages.back(), "Fit polynomials read error");
 }
 
 }  // namespace

@@ -1,15 +1,5 @@
 #include "quo_base/acquisition.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <cmath>
-#include <complex>
-#include <filesystem>
-#include <numbers>
-#include <string>
-#include <vector>
-
 #include "quo_base/datafile.h"
 #include "support/diagnostics.h"
 #include "support/fields.h"
@@ -56,24 +46,6 @@ TEST(Chirp, FollowsTheQuadraticPhase) {
             ASSERT_NEAR(sample.imag(), amplitude * std::sin(angle), 1e-6 * amplitude) << n;
         }
     }
-}
-
-TEST(ChirpOfABadPulse, IsRefused) {
-    const test::Report report;
-    for (const auto& row : test::read_table("objects/bad_pulses.csv")) {
-        SARPulse_Obj pulse;
-        set(pulse, std::stod(row[1]), std::stod(row[2]), std::stod(row[3]));
-        fcomplex sample = kGuard;
-        EXPECT_EQ(pulse.chirpSamples(), 0) << row[0];
-        EXPECT_EQ(pulse.generateChirp(&sample), 1) << row[0];
-        EXPECT_EQ(sample, kGuard) << row[0];
-    }
-    EXPECT_EQ(report.entries("ERROR").size(), 13U);
-    SARPulse_Obj good;
-    EXPECT_EQ(set(good, 1e-5, 1e6, 2e7).generateChirp(nullptr), 1);
-    constexpr int kMost = SARPulse_Obj::kMaxChirpSamples;
-    EXPECT_EQ(set(good, 1.0, 1e6, kMost).chirpSamples(), kMost);
-    EXPECT_EQ(set(good, 1.0, 1e6, kMost + 1.0).chirpSamples(), 0);
 }
 
 TEST(WriteChirp, WritesTheChirpAsOneLineOfComplexFloats) {

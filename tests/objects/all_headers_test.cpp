@@ -1,8 +1,3 @@
-#include <gtest/gtest.h>
-
-#include <filesystem>
-#include <string>
-
 #include "quo_base/quo_base.h"
 #include "support/diagnostics.h"
 

@@ -1,11 +1,3 @@
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <string>
-#include <string_view>
-#include <utility>
-#include <vector>
-
 #include "objects/records.h"
 #include "support/diagnostics.h"
 #include "support/raster.h"

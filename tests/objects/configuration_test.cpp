@@ -1,12 +1,4 @@
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
 #include <sys/inotify.h>
-#include <unistd.h>
-
-#include <cstdio>
-#include <string>
-#include <tuple>
-#include <vector>
 
 #include "quo_base/generalSAR.h"
 #include "quo_base/generalSAR_configuration.h"

@@ -1,15 +1,3 @@
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <concepts>
-#include <cstring>
-#include <filesystem>
-#include <functional>
-#include <memory>
-#include <string>
-#include <typeinfo>
-#include <vector>
-
 #include "objects/records.h"
 #include "support/diagnostics.h"
 #include "support/fields.h"

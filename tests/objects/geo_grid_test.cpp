@@ -1,12 +1,5 @@
 #include "quo_base/geo_grid.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <filesystem>
-#include <string>
-#include <vector>
-
 #include "objects/records.h"
 #include "support/diagnostics.h"
 #include "support/scenes.h"
@@ -14,19 +7,6 @@
 namespace {
 
 using testing::Each, testing::ElementsAre;
-
-// What else may be missing is tested with every object.
-TEST(GeoGrid, KeepsAPointThatIsMissing) {
-    const test::TemporaryFolder folder;
-    const std::string file = folder.file("header.xml");
-    geoCoords_Obj source, target;
-    test::fill(source);
-    const std::string whole = test::read_text(QUO_TEST_DATA "/objects/geoCoords_Obj.xml");
-    test::write_text(file, test::without_element(whole, "SouthWest"));
-    EXPECT_EQ(target.readhdr(file.c_str()), 0);
-    EXPECT_THAT(test::differences(source, target), ElementsAre("SouthWest.Point", "SouthWest.members"));
-    EXPECT_EQ(target.SouthWest.Latitude, -999.0);
-}
 
 TEST(GeoGrid, KeepsTheRasterInItsSideFile) {
     const test::TemporaryFolder folder;
@@ -47,22 +27,6 @@ TEST(GeoGrid, KeepsTheRasterInItsSideFile) {
 /** The named members in the order in which they travel. */
 std::vector<double> members(const geopoint& p) {
     return {p.Latitude, p.Longitude, p.Height, p.IncidenceAngle, p.LookAngle};
-}
-
-// Kept as callers know it: the named members follow the array even where nothing, or not enough, was read.
-TEST(Geopoint, TakesItsArrayWhateverTheFileHas) {
-    const test::TemporaryFolder folder;
-    const std::string file = folder.file("points.par");
-    test::write_text(file, "[Coordinates]\nSouthEast = {44.21 8.03}\n");
-    for (const char* name : {"Center", "", "no/such point", static_cast<const char*>(nullptr), "SouthEast"}) {
-        geopoint point;
-        point.Latitude = 45.37;
-        EXPECT_EQ(point.readhdr(file.c_str(), name), 0);
-        const bool there = name && name == std::string_view{"SouthEast"};
-        EXPECT_THAT(members(point), ElementsAre(there ? 44.21 : -999.0, there ? 8.03 : -999.0, -999, -999, -999));
-    }
-    for (const char* name : {"", "North West", "<x>"})
-        EXPECT_EQ(geopoint{}.writehdr(file.c_str(), name), 1) << name;
 }
 
 // --- the corners of a region, as an orbit sees them -----------------------------------------------------------

@@ -1,12 +1,6 @@
 #ifndef QUO_TESTS_RECORDS_H
 #define QUO_TESTS_RECORDS_H
 
-#include <cmath>
-#include <string>
-#include <tuple>
-#include <utility>
-#include <vector>
-
 #include "quo_base/Coregist.h"
 #include "quo_base/generalSAR.h"
 #include "quo_base/generalSAR_configuration.h"

@@ -128,6 +128,7 @@ constexpr Course kCourses[] = {
     {"LowOrbit", 693e3, -12.7, 9.7, 17, 200000},
     {"LowOrbitFiveVectors", 514e3, 192.4, 9.7, 5, 200000},
     {"LowOrbitMinutes", 693e3, 90.0, 60.0, 17, 100000},
+    {"LowOrbitVeryManyVectors", 693e3, -12.7, 0.01, 16001, 10000},
     {"NavigationSatellite", 20200e3, 40.0, 60.0, 40, 50000},
     {"Geostationary", 35786e3, 30.0, 300.0, 40, 50000},
     {"Revolution", 693e3, -12.7, 10.0, 700, 3000},  // no first guess: every point is searched for

@@ -1,12 +1,3 @@
-#include <gtest/gtest.h>
-
-#include <cmath>
-#include <cstdint>
-#include <limits>
-#include <string>
-#include <tuple>
-#include <vector>
-
 #include "orbit/made_orbits.h"
 #include "support/diagnostics.h"
 #include "support/fields.h"

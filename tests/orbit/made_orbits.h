@@ -1,12 +1,9 @@
 #ifndef QUO_TESTS_ORBIT_MADE_ORBITS_H
 #define QUO_TESTS_ORBIT_MADE_ORBITS_H
 
-#include <cmath>
-#include <cstddef>
-#include <stdexcept>
-
 #include "quo_base/generalSARorbit.h"
 #include "support/geometry.h"
+#include "support/prelude.h"
 
 namespace test {
 

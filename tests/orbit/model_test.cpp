@@ -1,10 +1,3 @@
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <cmath>
-#include <limits>
-#include <utility>
-
 #include "generalSAR/orbit/orbit_model.h"
 #include "orbit/made_orbits.h"
 #include "quo_base/interp_orb.h"

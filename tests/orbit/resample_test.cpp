@@ -1,14 +1,3 @@
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <array>
-#include <cmath>
-#include <limits>
-#include <numeric>
-#include <string>
-#include <utility>
-#include <vector>
-
 #include "orbit/made_orbits.h"
 #include "support/diagnostics.h"
 #include "support/fields.h"

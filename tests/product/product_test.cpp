@@ -1,19 +1,5 @@
 #include "quo_base/product.h"
 
-#include <gtest/gtest.h>
-
-#include <array>
-#include <cerrno>
-#include <cmath>
-#include <cstdint>
-#include <cstring>
-#include <filesystem>
-#include <limits>
-#include <memory>
-#include <string>
-#include <tuple>
-#include <vector>
-
 #include "objects/records.h"
 #include "support/diagnostics.h"
 #include "support/raster.h"

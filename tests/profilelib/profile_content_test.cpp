@@ -1,12 +1,5 @@
 #include "profilelib/profile_content.h"
 
-#include <gtest/gtest.h>
-
-#include <optional>
-#include <random>
-#include <string>
-#include <string_view>
-
 #include "profile_property.h"
 #include "support/diagnostics.h"
 #include "support/escapes.h"

@@ -1,8 +1,3 @@
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <string>
-
 #include "quo_base/profile.h"
 #include "support/diagnostics.h"
 #include "support/failing_memory.h"

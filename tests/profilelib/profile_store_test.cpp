@@ -1,20 +1,9 @@
-#include <gtest/gtest.h>
-
-#include <array>
-#include <cerrno>
-#include <filesystem>
-#include <optional>
-#include <random>
-#include <string>
-#include <string_view>
-
 #include "profile_property.h"
 #include "quo_base/profile.h"
 #include "support/diagnostics.h"
 
 namespace {
 
-namespace fs = std::filesystem;
 using test::read_text;
 using test::write_text;
 
@@ -41,24 +30,6 @@ const char* set(const std::string& file, const char* key, const char* value, con
 }
 int sync(const std::string& file) { return SyncProfile(file.c_str()); }
 
-TEST_F(ProfileStore, KeepsAFileFromTheFirstCallUntilItIsFreed) {
-    const std::string path = file("a.par", "[s]\nk = 1\n[t]\nk = 3\n");
-    EXPECT_EQ(sync(path), 0) << "a file that is not in memory is not written";
-    for (const char* told :
-         {"Warning: DelProfileKey called before init\nWarning: DelProfileSection called before init\n", ""}) {
-        test::CapturedStderr captured;
-        DelProfileKey("s", "k", path.c_str());
-        DelProfileSection("t", path.c_str());
-        EXPECT_EQ(captured.text(), told);
-        EXPECT_EQ(get(path, "k") != nullptr, *told != '\0');
-    }
-    write_text(path, "[s]\nk = 2\n");
-    EXPECT_EQ(get(path, "k"), nullptr);
-    EXPECT_STREQ(get(folder_.file("./a.par"), "k"), "2") << "another text of the path is another file";
-    EXPECT_EQ(sync(path), 0);
-    EXPECT_EQ(read_text(path), "\n[s]\n");
-}
-
 TEST_F(ProfileStore, PointersStayValidUntilTheirKeyChanges) {
     const std::string path = file("a.par", "[s]\nk = 17.3\nj = 1\n");
     const char* const value = get(path, "k");
@@ -75,50 +46,20 @@ TEST_F(ProfileStore, PointersStayValidUntilTheirKeyChanges) {
     EXPECT_STREQ(value, "17.3");
 }
 
-TEST_F(ProfileStore, NullArgumentsFindAndWriteNothing) {
-    const std::string path = file("a.par", "[s]\nk = 1\n");
-    const char *const name = path.c_str(), *const arguments[][4] = {{nullptr, "k", "v", name},
-                                                                    {"s", nullptr, "v", name},
-                                                                    {"s", "k", "v", nullptr}};
-    for (const auto& [section, key, value, in] : arguments)
-        EXPECT_TRUE(!GetSetProfileChar(0, section, key, value, in) &&
-                    !GetSetProfileChar(1, section, key, value, in));
-    EXPECT_EQ(set(path, "k", nullptr), nullptr);
-    get(path, "k");
-    DelProfileKey(nullptr, "k", name);
-    DelProfileKey("s", nullptr, name);
-    DelProfileSection(nullptr, name);
-    EXPECT_STREQ(get(path, "k"), "1");
-}
-
-// The result is that of the file loaded last, inverted: callers know it so.
-TEST_F(ProfileStore, SyncOfAllTellsOfTheFileLoadedLast) {
-    EXPECT_EQ(SyncProfile(nullptr), -1) << "with nothing in memory";
-    const std::string first = folder_.file("a.par"), second = folder_.file("b.par");
-    get(second, "k");
-    set(folder_.path().string(), "k", "1");
-    EXPECT_EQ(SyncProfile(nullptr), 0);
-    EXPECT_TRUE(fs::exists(second)) << "a file that was only asked for is made, empty";
-    set(first, "k", "2");
-    EXPECT_EQ(SyncProfile(nullptr), -1) << "the file that fails was loaded earlier";
-    EXPECT_EQ(read_text(first), "\n[s]\nk = 2\n");
-}
-
-// What is too long to be read must not be replaced by the little that is known of it, nor a folder or a device.
-TEST_F(ProfileStore, ReplacesNothingThatIsNoParameterFile) {
-    constexpr std::uintmax_t kTooLong = (1U << 30) + 1U;
-    const std::string raster = file("raster.bin", "[s]\nk = 1\n"), link = folder_.file("full.par");
-    fs::resize_file(raster, kTooLong);
-    fs::create_symlink("/dev/full", link);
-    for (const std::string& path :
-         {folder_.path().string(), std::string{}, link, raster, std::string{"/dev/null"}}) {
-        EXPECT_EQ(get(path, "k"), nullptr) << path;
-        EXPECT_STREQ(set(path, "k", "v"), "v");
-        EXPECT_EQ(sync(path), path == "/dev/null" ? 0 : 1) << path;
-        EXPECT_EQ(errno, 0);
+// Doubles go the way that the tests of the number texts cover; floats are narrowed on it.
+TEST_F(ProfileStore, FloatsCarrySevenDigits) {
+    std::mt19937 random{318309};
+    for (int i = 0; i < 2000; ++i) {
+        const auto value = std::bit_cast<float>(static_cast<std::uint32_t>(random() % 0x7F800000U));
+        std::array<char, 64> text{};
+        std::snprintf(text.data(), text.size(), "{%.7g}", static_cast<double>(value));
+        WriteMyProfileFloatArray("s", "k", &value, 1, missing_.c_str());
+        ASSERT_STREQ(get(missing_, "k"), text.data());
+        float found = 0.0F;
+        ASSERT_EQ(GetMyProfileFloatArray("s", "k", &found, 1, missing_.c_str()), 0);
+        ASSERT_EQ(found, std::strtof(text.data() + 1, nullptr)) << text.data();
+        errno = 0;  // strtof's own: it counts a subnormal number as out of range
     }
-    EXPECT_TRUE(fs::is_symlink(link) && fs::is_character_file(link) && fs::is_character_file("/dev/null"));
-    EXPECT_EQ(fs::file_size(raster), kTooLong);
 }
 
 /** A file on the disk, and as plain lists: what the store must show through its functions. */

@@ -1,10 +1,5 @@
 #include "quorelxmllib/field_table.h"
 
-#include <gtest/gtest.h>
-
-#include <limits>
-#include <string>
-
 #include "header_files.h"
 #include "shelf.h"
 

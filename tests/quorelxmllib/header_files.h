@@ -1,10 +1,6 @@
 #ifndef QUO_TESTS_HEADER_FILES_H
 #define QUO_TESTS_HEADER_FILES_H
 
-#include <cstdint>
-#include <string>
-#include <string_view>
-
 #include "quo_base/quorelxml_v2.h"
 #include "support/diagnostics.h"
 

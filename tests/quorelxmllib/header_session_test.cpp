@@ -1,10 +1,5 @@
 #include "quorelxmllib/header_session.h"
 
-#include <gtest/gtest.h>
-
-#include <filesystem>
-#include <string>
-
 #include "header_files.h"
 #include "shelf.h"
 

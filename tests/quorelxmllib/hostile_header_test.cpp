@@ -1,14 +1,6 @@
 #include <fcntl.h>
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
-#include <csignal>
-#include <string>
 #include <thread>
-#include <tuple>
-#include <vector>
 
 #include "header_files.h"
 #include "quorelxmllib/field_table.h"

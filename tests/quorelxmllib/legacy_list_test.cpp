@@ -1,17 +1,8 @@
 #include "quorelxmllib/legacy_list.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
 #include <locale.h>
 
-#include <cmath>
-#include <cstdlib>
-#include <numbers>
-#include <string>
-#include <vector>
-
 #include "support/diagnostics.h"
-#include "support/escapes.h"
 
 namespace {
 
@@ -27,25 +18,6 @@ TEST(ListFormat, RepeatsTheItemAndEndsWithTheLast) {
         EXPECT_TRUE(format.ends_with(list_format(2, type)));
     }
     EXPECT_EQ(list_format(2, -1) + list_format(2, 4) + list_format(0, 0), "");
-}
-
-TEST(ScanList, ReadsWhatFitsAndLeavesTheRest) {
-    std::vector<std::vector<std::string>> rows = test::read_table("headers/lists.txt", '|');
-    // What is beyond the room of a number is no part of it.
-    rows.push_back(
-        {"0." + std::string(5000, '1') + "e" + std::string(512, '0') + "1, 2.5", "0.1111111111111111111"});
-    for (const auto& row : rows) {
-        std::vector<double> expected(3, -17.3), values = expected;
-        for (std::size_t i = 1; i < row.size(); ++i) expected[i - 1] = std::stod(row[i]);
-        EXPECT_EQ(scan_list(test::unescaped(row[0]).c_str(), values.data(), 3), static_cast<int>(row.size()) - 1);
-        EXPECT_EQ(values, expected) << row[0].substr(0, 100);
-    }
-    float floats[2] = {};
-    EXPECT_EQ(scan_list("0.1, 1e300", floats, 2), 2);
-    EXPECT_TRUE(floats[0] == 0.1F && std::isinf(floats[1]));
-    std::int32_t ints[4] = {};
-    EXPECT_EQ(scan_list("-7, 2147483647, 3000000000, -3000000000", ints, 4), 4);
-    EXPECT_THAT(ints, testing::ElementsAre(-7, INT32_MAX, INT32_MAX, INT32_MIN));
 }
 
 // Every length around the blocks of the scan, and one whose format would not fit into 4096 characters. Each number

@@ -1,25 +1,11 @@
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
 #include <libxml/parser.h>
 #include <libxml/xpath.h>
-
-#include <algorithm>
-#include <cstring>
-#include <memory>
-#include <random>
-#include <regex>
-#include <set>
-#include <string>
-#include <string_view>
-#include <utility>
-#include <vector>
 
 #include "header_files.h"
 #include "support/fields.h"
 
 namespace {
 
-using test::header_text;
 using test::OpenDocument;
 using test::read_text;
 using test::write_text;
@@ -43,10 +29,6 @@ protected:
         write_text(file_, text);
         document_.initXmlFile(file_.c_str());
         return document_;
-    }
-    std::string saved() {
-        EXPECT_EQ(document_.write(), 0);
-        return read_text(file_);
     }
     test::TemporaryFolder folder_;
     const std::string file_ = folder_.file("header.xml");
@@ -104,46 +86,6 @@ TEST_F(QuorelxmlLayout, FindsWhatTheDocumentedExpressionFinds) {
     for (const char* name : {"..", "*", "../Description", "Sec[1]", "Sec/*", "@Number", "Sec//a", "//a", "/Sec/a",
                              "Sec/a/", "Sec/a/text()", "Sec|Other", "x:Sec", "\"]|//*[\"", ".", "Sec/./a"})
         EXPECT_EQ(document.countNodes(1, name), 0) << name;
-}
-
-TEST_F(QuorelxmlLayout, CountsTheChannelsItAdds) {
-    for (const char* count : {"1", "2147483647", "-2147483648", "many", ""}) {
-        OpenDocument& document = load(test::replaced(header_text(""), ">1<", ">" + std::string{count} + "<"));
-        EXPECT_EQ(document.createChannel(1) + document.createChannel(-2) + document.createField(7, "a"), 0);
-        EXPECT_TRUE(document.channelExists(7) && (*count != '1' || document.numberOfChannels() == 3));
-        EXPECT_NE(saved().find("  </Channel>\n  <Channel Number=\"-2\"/>\n  <Channel Number=\"7\">\n    <a/>\n"),
-                  std::string::npos);
-        EXPECT_EQ(read_text(file_).find(">3</NumberOfChannels>") != std::string::npos, *count == '1');
-    }
-}
-
-TEST_F(QuorelxmlLayout, MakesADocumentForTheFirstField) {
-    const std::int32_t value = 5;
-    EXPECT_EQ(document_.writeInt(1, "a", &value, 1), 0) << "nothing had been loaded";
-    EXPECT_EQ(load("<Other><a/></Other>").writeInt(1, "a", &value, 1), 0);
-    EXPECT_NE(saved().find("<Channel Number=\"1\">\n    <a>5</a>"), std::string::npos);
-    EXPECT_EQ(document_.setFormat(3, 0), 0);
-    EXPECT_EQ(document_.format(), "%.15g, %.15g, %.15g");
-    EXPECT_EQ(document_.setFormat(2, 9), 1);
-}
-
-/** Text inside the channel without line breaks and indentation. */
-std::string inside(const std::string& text) {
-    const auto start = text.find("<Channel Number=\"1\">") + 20;
-    return std::regex_replace(text.substr(start, text.find("</Channel>") - start), std::regex{"\n *"}, "");
-}
-
-// A field is created so often that there are as many of it as the row says, or goes where that is 0.
-TEST_F(QuorelxmlLayout, CreatesWhatIsMissingWhereItBelongsAndRemovesAWholeField) {
-    for (const auto& row : test::read_table("headers/changes.txt", '|')) {
-        SCOPED_TRACE(row[3]);
-        const char* const field = row[1].c_str();
-        const int count = std::stoi(row[2]);
-        EXPECT_EQ(load(header_text(row[0])).clearField(2, field), 0);
-        EXPECT_EQ(count ? document_.createField(1, field, count) : document_.clearField(1, field), 0);
-        EXPECT_EQ(inside(saved()), row[3]);
-        EXPECT_TRUE(document_.fieldHasCount(1, field, count));
-    }
 }
 
 // The children of one element, as the document has them and as a list of names and numbers in the order of the

@@ -1,12 +1,3 @@
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <functional>
-#include <string>
-#include <tuple>
-#include <utility>
-#include <vector>
-
 #include "header_files.h"
 #include "quo_base/quorelxml_v2.h"
 

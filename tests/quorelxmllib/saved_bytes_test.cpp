@@ -1,9 +1,3 @@
-#include <gtest/gtest.h>
-
-#include <iterator>
-#include <random>
-#include <string>
-
 #include "header_files.h"
 #include "shelf.h"
 #include "xml_header_property.h"

@@ -1,12 +1,8 @@
 #ifndef QUO_TESTS_SHELF_H
 #define QUO_TESTS_SHELF_H
 
-#include <cstdint>
-#include <memory>
-#include <string>
-#include <vector>
-
 #include "quo_base/quorelxml_v2.h"
+#include "support/prelude.h"
 
 namespace test {
 

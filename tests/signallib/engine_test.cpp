@@ -6,6 +6,7 @@
 #include "signallib/engines.h"
 #include "signallib/fft_engine.h"
 #include "signallib/memory_room.h"
+#include "signallib/own_fft/fft_plans.h"
 #include "signallib/plan_store.h"
 
 #ifdef __SANITIZE_ADDRESS__
@@ -21,28 +22,32 @@ using test::Engine;
 using test::Samples;
 
 TEST(FftEngine, AutoPrefersMklOnProcessorsOfItsMakerOnly) {
-    const auto own = quo::engine_order("auto", true), other = quo::engine_order("auto", false);
-    EXPECT_EQ(own.first, quo::engine_order("mkl", false).first);
-    EXPECT_EQ(own.second, quo::engine_order("fftw", true).first);
-    EXPECT_TRUE(other.first == own.second && other.second == own.first);
-    EXPECT_EQ(quo::engine_order("mkl", true).second, nullptr);
+    auto* const mkl = quo::engine_order("mkl", false)[0];
+    auto* const fftw = quo::engine_order("fftw", true)[0];
+    auto* const own = quo::engine_order("quo", true)[0];
+    EXPECT_EQ(quo::engine_order("auto", true), (quo::EngineOrder{mkl, own, fftw}));
+    EXPECT_EQ(quo::engine_order("auto", false), (quo::EngineOrder{own, fftw, mkl}));
+    EXPECT_EQ(quo::engine_order("mkl", true)[1], nullptr);
 }
 
 // FFTW ended the process when an allocation of its own failed, while it planned and while it ran.
 TEST(FftMemory, ShortageOfAnyDegreeGivesAStatus) {
-    const Engine engine{"fftw"};
     constexpr int kPrime = 60539;  // runs through buffers of several times its length
     Samples data = test::noise(kPrime);
-    for (const auto& [n, m] : {std::pair{10007, 1}, {1, 32768}, {5, 10009}, {300, 200}}) {
-        SCOPED_TRACE(testing::Message() << n << " x " << m);
-        int status = -1;
-        for (rlim_t room = 256 << 10; status != 0 && room < rlim_t{1} << 30; room += room / 3) {
-            const test::AddressSpace limit{room};
-            status = fft_c(n, n, m, m, n > m, n <= m, data.data(), data.data());
-            EXPECT_TRUE(status == 0 || status == (n > m ? 4 : 5) || status == 7) << status;
+    for (const char* choice : {"quo", "fftw"})
+        for (const auto& [n, m] :
+             {std::pair{choice[0] == 'q' ? 10000 : 10007, 1}, {1, 32768}, {5, 10080}, {300, 200}}) {
+            SCOPED_TRACE(testing::Message() << choice << " " << n << " x " << m);
+            const Engine engine{choice};
+            int status = -1;
+            for (rlim_t room = 64 << 10; status != 0 && room < rlim_t{1} << 30; room += room / 3) {
+                const test::AddressSpace limit{room};
+                status = fft_c(n, n, m, m, n > m, n <= m, data.data(), data.data());
+                EXPECT_TRUE(status == 0 || status == (n > m ? 4 : 5) || status == 7) << status;
+            }
+            EXPECT_EQ(status, 0);
         }
-        EXPECT_EQ(status, 0);
-    }
+    const Engine engine{"fftw"};
     FftPlan plan{};
     ASSERT_EQ(fft_makep_c(&plan, kPrime, kPrime, 1, 1, 1, 0, 1), 0);
     {
@@ -105,13 +110,58 @@ INSTANTIATE_TEST_SUITE_P(Host, LoadingOrder,
                          testing::Values("MklFirstLocal", "MklFirstGlobal", "FftwFirstLocal", "FftwFirstGlobal"),
                          [](const auto& row) { return row.param; });
 
+// Every way of our own engine at every width of vector that the processor has, at numbers of transforms that fill
+// no vector and at ones that fill several: all of them meet the truth.
+TEST(OwnFft, EveryWidthOfVectorMeetsTheTruth) {
+    using quo::FftWay;
+    constexpr std::ptrdiff_t kSpare = 3;
+    for (const int lanes : {4, 8, 16})
+        for (const auto& [way, length] : {std::pair{FftWay::Columns, 7},
+                                          {FftWay::Columns, 120},
+                                          {FftWay::Columns, 1080},
+                                          {FftWay::ShortRows, 3},
+                                          {FftWay::ShortRows, 9},
+                                          {FftWay::ShortRows, 180},
+                                          {FftWay::Rows, 256},
+                                          {FftWay::Rows, 2310 / 11 * 10},
+                                          {FftWay::Rows, 36000},
+                                          {FftWay::Rows, 72000}})
+            for (const int count : {1, 17, 70})
+                for (const bool forward : {true, false}) {
+                    if (!quo::fft_kernels(lanes) || (length > 30000 && count > 1)) continue;
+                    SCOPED_TRACE(testing::Message() << lanes << " lanes, " << count << " of " << length);
+                    const bool rows = way != FftWay::Columns;
+                    const auto pitch = (rows ? length : count) + kSpare;
+                    const auto number = static_cast<std::size_t>(pitch * (rows ? count : length));
+                    const Samples in = test::noise(number);
+                    Samples out = in;
+                    const quo::FftTables tables{{way, length, forward, lanes}};
+                    std::vector<float> room(tables.room());
+                    tables.run(reinterpret_cast<const float*>(out.data()), reinterpret_cast<float*>(out.data()),
+                               2 * pitch, count, room.data());
+                    for (const int t : {0, count / 2, count - 1}) {
+                        Samples x, got;
+                        for (std::ptrdiff_t k = 0; k < length; ++k) {
+                            const auto at = static_cast<std::size_t>(rows ? t * pitch + k : k * pitch + t);
+                            x.push_back(in[at]);
+                            got.push_back(out[at]);
+                        }
+                        ASSERT_LE(test::relative_error(got, test::exact_dft(x, forward)),
+                                  2e-7 * std::log2(length));
+                    }
+                    for (std::size_t k = number - kSpare; k < number; ++k) EXPECT_EQ(out[k], in[k]);
+                }
+}
+
 /** Counts what is made of it; makes batches that do nothing. */
 struct CountingEngine final : quo::FftEngine {
     struct Batch final : quo::FftBatch {
         bool run(const float* /*in*/, float* /*out*/, quo::FftFailure& /*why*/) noexcept override { return true; }
     };
     [[nodiscard]] const char* name() const noexcept override { return "counting"; }
-    [[nodiscard]] int tiled_from() const noexcept override { return 2048; }
+    [[nodiscard]] bool wants_tile(const quo::FftGeometry& columns) const noexcept override {
+        return columns.length >= 2048;
+    }
     [[nodiscard]] std::unique_ptr<quo::FftBatch> make(const quo::FftGeometry& /*geometry*/,
                                                       quo::FftFailure& /*why*/) noexcept override {
         ++made;

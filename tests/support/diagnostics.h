@@ -1,25 +1,8 @@
 #ifndef QUO_TESTS_SUPPORT_DIAGNOSTICS_H
 #define QUO_TESTS_SUPPORT_DIAGNOSTICS_H
 
-#include <gtest/gtest.h>
-#include <unistd.h>
-
-#include <algorithm>
-#include <cerrno>
-#include <cstdio>
-#include <cstdlib>
-#include <cstring>
-#include <filesystem>
-#include <fstream>
-#include <iterator>
-#include <sstream>
-#include <stdexcept>
-#include <string>
-#include <string_view>
-#include <utility>
-#include <vector>
-
 #include "quo_base/ckerr.h"
+#include "support/prelude.h"
 
 namespace test {
 

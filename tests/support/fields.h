@@ -1,34 +1,14 @@
 #ifndef QUO_TESTS_SUPPORT_FIELDS_H
 #define QUO_TESTS_SUPPORT_FIELDS_H
 
-#include <gtest/gtest.h>
-
-#include <charconv>
-#include <cstddef>
-#include <cstdint>
-#include <cstdio>
-#include <cstring>
-#include <iterator>
-#include <sstream>
-#include <string>
-#include <string_view>
-#include <type_traits>
-#include <utility>
-#include <vector>
-
 #include "quo_base/quorelxml_v2.h"
 #include "support/diagnostics.h"
+#include "support/escapes.h"
 
 /** Header objects seen from outside: what their documentation promises, field by field, and the means to fill,
  * compare, print and damage them without knowing their class. */
 namespace test {
 
-/** The shortest text that tells a number from any other of its type. */
-template <typename Number>
-std::string digits(Number value) {
-    char buffer[40];
-    return {buffer, std::to_chars(buffer, std::end(buffer), value).ptr};
-}
 inline std::string digits(char* text) { return text; }
 
 /** Calls `use` with each value of an element: a reference to a number, the place of a text. */
@@ -86,14 +66,6 @@ inline std::vector<std::string> differing_fields(const GeneralSAR_BaseXML& a, co
     return names;
 }
 
-/** Names of all elements, in the order of registration. */
-inline std::vector<std::string> field_names(const GeneralSAR_BaseXML& object) {
-    std::vector<std::string> names;
-    names.reserve(static_cast<std::size_t>(object.elementCount()));
-    for (int i = 0; i < object.elementCount(); ++i) names.emplace_back(object.element(i)->name);
-    return names;
-}
-
 /** What is promised of a field. */
 struct ListedField {
     std::string key;          ///< in parameter files; "-" where it is not read from them, empty where none is read
@@ -136,20 +108,6 @@ inline std::string without_element(std::string file, const std::string& name) {
     const auto start = file.find("<" + name + ">"), end = file.find("</" + name + ">");
     EXPECT_TRUE(start != file.npos && end != file.npos) << name;
     return file.erase(start, end + name.size() + 3 - start);
-}
-
-/** Names of the children of an element, which stand in lines of their own two blanks further in. */
-inline std::vector<std::string> child_names(const std::string& file, const std::string& parent) {
-    std::vector<std::string> names;
-    std::istringstream lines{file};
-    std::string line;
-    while (std::getline(lines, line) && line.find("<" + parent + ">") == line.npos) {
-    }
-    const std::string inside = line.substr(0, line.find('<')) + "  <", end = "</" + parent;
-    while (std::getline(lines, line) && line.find(end) == line.npos)
-        if (line.starts_with(inside) && line[inside.size()] != '/')
-            names.push_back(line.substr(inside.size(), line.find_first_of(" />", inside.size()) - inside.size()));
-    return names;
 }
 
 }  // namespace test

@@ -2,12 +2,8 @@
 #define QUO_TESTS_SUPPORT_LIMITS_H
 
 #include <sys/resource.h>
-#include <unistd.h>
 
-#include <cerrno>
-#include <csignal>
-#include <cstdlib>
-#include <stdexcept>
+#include "support/prelude.h"
 
 namespace test {
 

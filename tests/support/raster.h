@@ -1,14 +1,8 @@
 #ifndef QUO_TESTS_SUPPORT_RASTER_H
 #define QUO_TESTS_SUPPORT_RASTER_H
 
-#include <algorithm>
-#include <cstddef>
-#include <cstdint>
-#include <cstring>
-#include <string>
-#include <vector>
-
 #include "quo_base/datafile.h"
+#include "support/prelude.h"
 
 namespace test {
 

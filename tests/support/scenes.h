@@ -1,13 +1,6 @@
 #ifndef QUO_TESTS_SUPPORT_SCENES_H
 #define QUO_TESTS_SUPPORT_SCENES_H
 
-#include <cmath>
-#include <limits>
-#include <ostream>
-#include <stdexcept>
-#include <string>
-#include <vector>
-
 #include "quo_base/generalSARorbit.h"
 #include "quo_base/quorelxml_v2.h"
 #include "support/diagnostics.h"

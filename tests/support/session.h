@@ -1,14 +1,7 @@
 #ifndef QUO_TESTS_SUPPORT_SESSION_H
 #define QUO_TESTS_SUPPORT_SESSION_H
 
-#include <gtest/gtest.h>
-
-#include <cstdint>
 #include <iomanip>
-#include <sstream>
-#include <string>
-#include <utility>
-#include <vector>
 
 #include "support/diagnostics.h"
 
@@ -76,7 +69,7 @@ void run_session(const char* script, const std::string& session, Call call) {
     while (std::getline(lines, line) && line != start && !line.starts_with(start + " ")) {
     }
     while (std::getline(lines, line) && !line.starts_with("== ")) {
-        for (std::size_t at = 0; (at = line.find('@')) != line.npos;) line.replace(at, 1, value);
+        for (std::size_t at = 0; !value.empty() && (at = line.find('@')) != line.npos;) line.replace(at, 1, value);
         if (line.empty() || line[0] == '#') continue;
         if (line[0] == '|') {
             wanted += line.ends_with('\\') ? line.substr(2, line.size() - 3) : line.erase(0, 2) + "\n";

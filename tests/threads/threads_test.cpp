@@ -1,20 +1,7 @@
-#include <gtest/gtest.h>
-
-#include <array>
 #include <atomic>
 #include <barrier>
-#include <cerrno>
-#include <cmath>
-#include <complex>
-#include <cstdlib>
-#include <cstring>
-#include <filesystem>
-#include <functional>
-#include <map>
 #include <regex>
-#include <string>
 #include <thread>
-#include <vector>
 
 #include "diagnosticslib/call_frame.h"
 #include "quo_base/SARpolynomials.h"

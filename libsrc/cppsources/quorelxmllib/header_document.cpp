@@ -133,28 +133,57 @@ bool HeaderDocument::can_hold(std::int64_t count) const noexcept {
 
 namespace {
 
-std::size_t hash_of(std::string_view name) noexcept { return std::hash<std::string_view>{}(name); }
+std::uint32_t hash_of(std::string_view name) noexcept {
+    return static_cast<std::uint32_t>(std::hash<std::string_view>{}(name)) | 1U;
+}
 bool can_be_found(const HeaderTree& tree, Node node) noexcept {
     return tree.is_element(node) && !tree.in_namespace(node);
 }
 
 }  // namespace
 
-const std::vector<Node>* NameIndex::find(std::string_view name) const noexcept {
-    const auto found = children_.find(hash_of(name));
-    return found == children_.end() ? nullptr : &found->second;
+/** The slot of a hash, or the free one that it would get. */
+std::size_t NameIndex::place_of(std::uint32_t hash) const noexcept {
+    std::size_t place = (hash >> 1U) & (slots_.size() - 1);
+    while (slots_[place].hash != 0 && slots_[place].hash != hash) place = (place + 1) & (slots_.size() - 1);
+    return place;
+}
+
+std::span<const Node> NameIndex::find(std::string_view name) const noexcept {
+    if (slots_.empty()) return {};
+    const Slot& slot = slots_[place_of(hash_of(name))];
+    if (slot.group != 0) return groups_[slot.group - 1];
+    return {&slot.only, slot.only == Node::none ? 0U : 1U};
+}
+
+void NameIndex::grow() {
+    std::vector<Slot> before(std::max<std::size_t>(64, 2 * slots_.size()));
+    before.swap(slots_);
+    for (const Slot& slot : before)
+        if (slot.hash != 0) slots_[place_of(slot.hash)] = slot;
 }
 
 void NameIndex::add(const HeaderTree& tree, Node child) {
-    if (can_be_found(tree, child)) children_[hash_of(tree.name(child))].push_back(child);
+    if (!can_be_found(tree, child)) return;
+    if (2 * used_ >= slots_.size()) grow();
+    const std::uint32_t hash = hash_of(tree.name(child));
+    Slot& slot = slots_[place_of(hash)];
+    if (slot.group == 0 && slot.only != Node::none) {
+        groups_.push_back({slot.only});
+        slot.group = static_cast<std::uint32_t>(groups_.size());
+    }
+    if (slot.group != 0) return groups_[slot.group - 1].push_back(child);
+    used_ += slot.hash == 0 ? 1 : 0;
+    slot = {hash, 0, child};
 }
 
 bool NameIndex::forget(const HeaderTree& tree, Node child) noexcept {
     if (!can_be_found(tree, child)) return true;
-    const auto found = children_.find(hash_of(tree.name(child)));
+    if (slots_.empty()) return false;
+    Slot& slot = slots_[place_of(hash_of(tree.name(child)))];
     // With several of the name the search for one would cost.
-    if (found == children_.end() || found->second.size() > 1) return false;
-    children_.erase(found);
+    if (slot.group != 0 || slot.only != child) return false;
+    slot.only = Node::none;
     return true;
 }
 

@@ -17,17 +17,27 @@ namespace quo {
 
 class AtomicFile;
 
-/** The child elements of a parent by name, in document order. */
+/** The child elements of a parent by name, in document order: a table without a block of memory for each name. */
 class NameIndex {
 public:
-    /** The children that bear the name, and now and then others: see HeaderTree::is_named. Null for none. */
-    [[nodiscard]] const std::vector<Node>* find(std::string_view name) const noexcept;
+    /** The children that bear the name, and now and then others: see HeaderTree::is_named. */
+    [[nodiscard]] std::span<const Node> find(std::string_view name) const noexcept;
     void add(const HeaderTree& tree, Node child);
     /** Forgets a child that goes; false when the index cannot do that at once. */
     bool forget(const HeaderTree& tree, Node child) noexcept;
 
 private:
-    std::unordered_map<std::size_t, std::vector<Node>> children_;  // by the hash of the name
+    struct Slot {
+        std::uint32_t hash;   // of the name; 0 while the slot is free
+        std::uint32_t group;  // from 1 on, of those that bear the name, or 0
+        Node only;            // the only one, or none
+    };
+    [[nodiscard]] std::size_t place_of(std::uint32_t hash) const noexcept;
+    void grow();
+
+    std::vector<Slot> slots_;                // a power of two, half of them free
+    std::vector<std::vector<Node>> groups_;  // of names that several bear
+    std::size_t used_ = 0;
 };
 
 /** One header document: the tree, and the look-ups and changes that the field layout needs. Paths are walked name
@@ -114,10 +124,8 @@ private:
         if (!last && rest.empty()) return true;  // a path that ends with a slash leads nowhere
         const auto go_on = [&](Node node) { return last ? see(node) : visit_below(node, rest, see); };
         const auto go_on_if_named = [&](Node node) { return !tree_.is_named(node, name) || go_on(node); };
-        if (const NameIndex* index = index_of(parent)) {
-            const std::vector<Node>* named = index->find(name);
-            return !named || std::ranges::all_of(*named, go_on_if_named);
-        }
+        if (const NameIndex* index = index_of(parent))
+            return std::ranges::all_of(index->find(name), go_on_if_named);
         std::int64_t passed = 0;
         Node node = tree_.first(parent);
         for (; node != Node::none; node = tree_.next(node)) {

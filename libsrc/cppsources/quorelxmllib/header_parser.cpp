@@ -13,6 +13,7 @@
 #include <vector>
 
 #include "quo_base/api.h"
+#include "quorelxmllib/header_scanner.h"
 
 namespace quo {
 namespace {
@@ -310,6 +311,11 @@ int read_text(void* context, char* buffer, int length) {
 }  // namespace
 
 int parse_header(HeaderSource& source, HeaderTree& tree, std::string* defect) {
+    if (source.rewind()) {
+        const int status = scan_header(source, tree);
+        if (defect) defect->clear();
+        if (status != QUO_REFUSED || !source.rewind()) return status;
+    }
     return parse_file(source, tree, nullptr, defect);
 }
 

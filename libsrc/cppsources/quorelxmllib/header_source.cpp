@@ -29,6 +29,13 @@ int HeaderSource::open(const char* file) noexcept {
     return found.st_size > quorelxml::kMostFileBytes ? unread(EFBIG) : QUO_OK;
 }
 
+bool HeaderSource::rewind() noexcept {
+    const bool rewound = ::lseek(file_.get(), 0, SEEK_SET) == 0;
+    bytes_ = rewound ? 0 : bytes_;
+    errno = 0;
+    return rewound;
+}
+
 int HeaderSource::read(void* source, char* buffer, int length) noexcept {
     auto& self = *static_cast<HeaderSource*>(source);
     const ssize_t got =

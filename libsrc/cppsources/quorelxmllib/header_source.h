@@ -61,12 +61,14 @@ public:
     /** 0; 1 when there is no file; 4 when it is there but cannot be opened, 7 when it is too large: errno tells.
      */
     int open(const char* file) noexcept;
+    /** Starts from the first byte again; false where the file, such as a pipe, gives its bytes only once. */
+    bool rewind() noexcept;
     /** libxml2's read call; `source` is the HeaderSource. */
     static int read(void* source, char* buffer, int length) noexcept;
 
     /** How reading went so far: 0, or 4 or 7 with errno set. */
     [[nodiscard]] int status() const noexcept;
-    /** Bytes read so far. */
+    /** Bytes read so far, since the start. */
     [[nodiscard]] std::int64_t bytes() const noexcept { return bytes_; }
 
 private:

@@ -339,6 +339,20 @@ int BufferFile::write(const void* src, int n) {
     return n;
 }
 
+int BufferFile::copyFrom(BufferFile& source, int64_t n) {
+    const Quiet quiet;
+    if (!is_writing() || !source.is_open() || source.mode_ == WRITE || &source == this || n < 0)
+        return QUO_REFUSED;
+    if (!source.flush()) return source.status_;
+    if (!flush()) return status_;
+    const int status = n > 0 ? quo::copy_range(*source.stream_, source.place(), *stream_, place(), n) : QUO_OK;
+    (status == QUO_READ_FAILED ? source : *this).note(status);
+    if (status != QUO_OK) n = 0;
+    source.dropBuffer(source.place() + n);
+    dropBuffer(place() + n);
+    return status;
+}
+
 void BufferFile::readBlock(void* dst, int memory_type, int first_line, int lines, int first_sample, int samples) {
     const Quiet quiet;
     const auto kernel = quo::find_kernel(quo::SampleAccess::kBlockRead, CellType, memory_type);

@@ -2,6 +2,7 @@
 #define QUO_KERNEL_TABLE_H
 
 #include "datafilelib/sample_kernels.h"
+#include "sarutillib/ground/processor_level.h"
 
 namespace quo {
 
@@ -16,6 +17,13 @@ extern const KernelTable kTable;  ///< for every processor
 namespace kernels_avx2 {
 extern const KernelTable kTable;  ///< for processors with AVX2; the same results
 }
+namespace kernels_avx512 {
+extern const KernelTable
+    kTable;  ///< for processors with AVX-512, bytes and short vectors included; the same results
+}
+
+/** The kernels of a level, which the processor must have. */
+const KernelTable& kernel_table(ProcessorLevel level) noexcept;
 
 }  // namespace quo
 

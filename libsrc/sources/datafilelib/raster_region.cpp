@@ -16,6 +16,8 @@ namespace {
 
 // Large enough to make system calls rare, small enough to stay in the second-level cache while it is converted.
 constexpr std::int64_t kChunk = std::int64_t{1} << 19;
+// More for writing, where each call costs a journal's entry beside the copying.
+constexpr std::int64_t kWriteChunk = 2 * kChunk;
 // Pieces nearer to each other than this are read in one transfer with what lies between.
 constexpr std::int64_t kSmallGap = 4096;
 
@@ -106,16 +108,21 @@ private:
     char* to_;
 };
 
-int copy_bytes(const RasterStream& from, AtomicFile& to) {
-    const auto length = from.length();
-    if (!length) return QUO_READ_FAILED;
-    TrackedBuffer<char> chunk{static_cast<std::size_t>(kChunk)};
+// By way of memory, as far as the system does not copy by itself.
+int copy_through_memory(const RasterStream& from, std::int64_t place, const RasterStream& to,
+                        std::int64_t to_place, std::int64_t bytes) {
+    TrackedBuffer<char> chunk{static_cast<std::size_t>(std::min(kChunk, bytes))};
     if (!chunk) return QUO_NO_MEMORY;
-    const auto read = [&](std::int64_t place, char* to_piece, std::size_t size) {
-        return from.read_at(place, to_piece, size);
+    std::int64_t written = to_place;
+    const auto read = [&](std::int64_t done, char* piece, std::size_t size) {
+        return from.read_at(place + done, piece, size);
     };
-    const auto write = [&](std::string_view piece) { return to.write(piece); };
-    switch (copy_pieces(*length, {chunk.data(), chunk.size()}, read, write)) {
+    const auto write = [&](std::string_view piece) {
+        const Transfer moved = to.write_at(written, piece.data(), piece.size());
+        written += static_cast<std::int64_t>(moved.bytes);
+        return moved.bytes == piece.size();
+    };
+    switch (copy_pieces(bytes, {chunk.data(), chunk.size()}, read, write)) {
         case Copied::kWhole:
             return QUO_OK;
         case Copied::kNotRead:
@@ -199,7 +206,7 @@ int write_region(const RasterStream& stream, const RasterRegion& region, const R
                  const char* from) {
     if (region.count == 0 || region.piece == 0) return QUO_OK;
     const bool gapless = region.distance == region.piece;
-    const std::int64_t at_once = gapless ? std::max<std::int64_t>(1, kChunk / region.piece) : 1;
+    const std::int64_t at_once = gapless ? std::max<std::int64_t>(1, kWriteChunk / region.piece) : 1;
     TrackedBuffer<char> scratch{static_cast<std::size_t>(std::min(at_once, region.count) * region.piece)};
     if (!scratch) return QUO_NO_MEMORY;
     for (std::int64_t done = 0; done < region.count; done += at_once) {
@@ -219,6 +226,14 @@ int write_region(const RasterStream& stream, const RasterRegion& region, const R
         }
     }
     return QUO_OK;
+}
+
+int copy_range(const RasterStream& from, std::int64_t place, const RasterStream& to, std::int64_t to_place,
+               std::int64_t bytes) {
+    const auto copied =
+        static_cast<std::int64_t>(from.copy_to(place, to, to_place, static_cast<std::size_t>(bytes)));
+    if (copied == bytes) return QUO_OK;
+    return copy_through_memory(from, place + copied, to, to_place + copied, bytes - copied);
 }
 
 const char* raster_failure(int status) noexcept {
@@ -247,7 +262,11 @@ int copy_raster(const char* from, const char* to, bool overwrite, std::optional<
     if (!source.open(from, RasterStream::Mode::kRead)) return QUO_NOT_OPENED;
     copy.emplace(to);
     if (!copy->good() || !(exists || keep_closed(source.descriptor(), copy->descriptor()))) return QUO_NOT_OPENED;
-    return copy_bytes(source, *copy);
+    const auto length = source.length();
+    if (!length) return QUO_READ_FAILED;
+    RasterStream target;
+    if (!target.open_same(copy->descriptor())) return QUO_NOT_OPENED;
+    return copy_range(source, 0, target, 0, *length);
 }
 
 }  // namespace quo

@@ -51,6 +51,10 @@ int read_region(const RasterStream& stream, const RasterRegion& region, const Re
 int write_region(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout,
                  const char* from);
 
+/** Copies bytes of one file to a place of another. 0, 4 also where the source ends before, 5, or 7. */
+int copy_range(const RasterStream& from, std::int64_t place, const RasterStream& to, std::int64_t to_place,
+               std::int64_t bytes);
+
 /** What an entry of the report says about a status of the raster classes. */
 const char* raster_failure(int status) noexcept;
 

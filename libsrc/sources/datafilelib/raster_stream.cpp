@@ -73,6 +73,16 @@ Transfer RasterStream::write_at(std::int64_t offset, const void* from, std::size
     });
 }
 
+std::size_t RasterStream::copy_to(std::int64_t offset, const RasterStream& to, std::int64_t place,
+                                  std::size_t size) const noexcept {
+    const Transfer moved = move_all(size, [&](std::size_t done, std::size_t left) {
+        off_t from_here = offset + static_cast<off_t>(done), to_there = place + static_cast<off_t>(done);
+        return copy_file_range(descriptor_, &from_here, to.descriptor_, &to_there, left, 0);
+    });
+    errno = 0;
+    return moved.bytes;
+}
+
 bool raster_exists(const char* path) noexcept {
     RasterStream stream;
     const int kept = errno;

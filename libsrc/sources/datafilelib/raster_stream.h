@@ -32,6 +32,10 @@ public:
     /** Where the system refuses, errno tells why. */
     Transfer read_at(std::int64_t offset, void* to, std::size_t size) const noexcept;
     Transfer write_at(std::int64_t offset, const void* from, std::size_t size) const noexcept;
+    /** Has the system copy bytes to a place of another file by itself. How many it did: not every file system and
+     * pair of files can be copied so, and why the rest was not shows when it is read and written. errno is 0. */
+    std::size_t copy_to(std::int64_t offset, const RasterStream& to, std::int64_t place,
+                        std::size_t size) const noexcept;
 
 private:
     int descriptor_ = -1;

@@ -1,7 +1,6 @@
 #include "datafilelib/sample_kernels.h"
 
 #include "datafilelib/kernel_table.h"
-#include "sarutillib/ground/processor_level.h"
 
 namespace quo {
 namespace {
@@ -10,15 +9,16 @@ constexpr std::size_t kSizes[kCellTypes] = {8, 4, 16, 8, 8, 4, 4, 2, 2, 1};
 
 bool is_cell_type(int code) noexcept { return code >= 0 && code < kCellTypes; }
 
-const KernelTable& table_for_this_processor() noexcept {
-    return processor_level() >= ProcessorLevel::kAvx2 ? kernels_avx2::kTable : kernels_any::kTable;
-}
-
 }  // namespace
+
+const KernelTable& kernel_table(ProcessorLevel level) noexcept {
+    if (level >= ProcessorLevel::kAvx512) return kernels_avx512::kTable;
+    return level >= ProcessorLevel::kAvx2 ? kernels_avx2::kTable : kernels_any::kTable;
+}
 
 SampleKernel find_kernel(SampleAccess access, int file_type, int memory_type) noexcept {
     if (!is_cell_type(file_type) || !is_cell_type(memory_type)) return nullptr;
-    return table_for_this_processor().kernels[static_cast<int>(access)][memory_type][file_type];
+    return kernel_table(processor_level()).kernels[static_cast<int>(access)][memory_type][file_type];
 }
 
 std::size_t sample_size(int cell_type) noexcept { return is_cell_type(cell_type) ? kSizes[cell_type] : 0; }

@@ -7,6 +7,7 @@
 #include <utility>
 
 #include "diagnosticslib/call_frame.h"
+#include "matrixlib/dense_kernels.h"
 #include "matrixlib/matrix_kernels.h"
 #include "quo_base/gr_pt.h"
 #include "sarutillib/ground/checked_size.h"
@@ -19,10 +20,15 @@ void say(const char* message) noexcept { std::fputs(message, stderr); }
 
 namespace {
 
+using quo::dense_kernels;
 using quo::FlatRows;
 using quo::Rows;
 using quo::subtract_multiple;
 
+// Triangles of so many rows, and panels of so many columns, are worked through row by row, greater ones by halves;
+// up to kSmall rows a matrix is not halved at all.
+constexpr int kLeaf = 8, kSmall = 64;
+int leaf_of(int n) { return n > kSmall ? kLeaf : kSmall; }
 // What a zero pivot becomes, so that a matrix that is singular to rounding still has factors.
 constexpr double kTinyPivot = 1e-20;
 
@@ -58,50 +64,188 @@ int scaled_pivot_row(const Matrix& a, int n, int column, const double* scale) {
     return best;
 }
 
-// Factors `a` in place, row by row so that the inner loop runs along memory. exchanged[j] is the row that stage j
-// swapped with row j; the result is the parity of the exchanges.
-template <typename Matrix>
-double factor_lu(const Matrix& a, int n, double* scale, int* exchanged) {
-    double parity = 1.0;
-    for (int j = 0; j < n; ++j) {
-        const int pivot = scaled_pivot_row(a, n, j, scale);
-        exchanged[j] = pivot;
-        if (pivot != j) {
-            std::swap_ranges(a[pivot], a[pivot] + n, a[j]);
-            scale[pivot] = scale[j];
-            parity = -parity;
-        }
-        double* top = a[j];
-        if (top[j] == 0.0) top[j] = kTinyPivot;
-        const double inverse = 1.0 / top[j];
-        for (int i = j + 1; i < n; ++i) {
-            double* row = a[i];
-            row[j] *= inverse;
-            subtract_multiple(row + j + 1, top + j + 1, row[j], n - j - 1);
-        }
-    }
-    return parity;
+/** Part of an axis: the first index and the one after the last. */
+struct Range {
+    int first, last;
+    [[nodiscard]] int count() const { return last - first; }
+    [[nodiscard]] Range upper_half() const { return {first, first + count() / 2}; }
+    [[nodiscard]] Range lower_half() const { return {first + count() / 2, last}; }
+};
+
+/** Calls work(piece) for pieces of a range, one after another. */
+template <typename Work>
+void by_pieces(Range range, int most, Work work) {
+    for (int first = range.first; first < range.last; first += most)
+        work(Range{first, std::min(first + most, range.last)});
 }
 
-// Inverse from the factors: all unit columns are carried along at once, so that the inner loops run along rows.
-// Row i of L^-1 P has no entry right of the columns that its pivots reached; whole rows are swept all the same
-// above a size where the branch would cost more than it saves.
+/** Takes products of matrix parts off others, tile by tile. */
+template <typename Factors, typename Matrix>
+class Product {
+public:
+    Product(const Factors& a, const Matrix& b) : a_{a}, b_{b} {}
+
+    /** c[rows][columns] -= a[rows][inner] * b[inner][columns]. */
+    void subtract(const Matrix& c, Range rows, Range inner, Range columns) {
+        by_pieces(inner, kStripRows, [&](Range part) {
+            by_pieces(columns, kernels_.tile_columns, [&](Range strip) {
+                fill_strip(part, strip);
+                by_pieces(rows, kTileRows, [&](Range tile) { subtract_tile(c, tile, part, strip); });
+            });
+        });
+    }
+
+private:
+    static constexpr int kTileRows = quo::DenseKernels::kTileRows, kMostColumns = 16;
+    static constexpr int kStripRows = 128;  // whose strip stays in the nearest cache while the rows pass
+
+    // One row of b after another, with zeros where the columns end.
+    void fill_strip(Range rows, Range columns) {
+        double* to = strip_;
+        for (int k = rows.first; k < rows.last; ++k, to += kernels_.tile_columns) {
+            std::copy(b_[k] + columns.first, b_[k] + columns.last, to);
+            std::fill(to + columns.count(), to + kernels_.tile_columns, 0.0);
+        }
+    }
+
+    // Where the columns end a tile is worked on aside. Rows that it lacks are its last one once more, with the
+    // same result.
+    void subtract_tile(const Matrix& c, Range rows, Range inner, Range columns) const {
+        const bool aside = columns.count() < kernels_.tile_columns;
+        double edge[kTileRows][kMostColumns] = {};
+        const double* factors[kTileRows];
+        double *tile[kTileRows], *places[kTileRows];
+        for (int r = 0; r < kTileRows; ++r) {
+            const int row = std::min(rows.first + r, rows.last - 1);
+            factors[r] = a_[row] + inner.first;
+            places[r] = c[row] + columns.first;
+            tile[r] = aside ? edge[r] : places[r];
+            if (aside) std::copy_n(places[r], columns.count(), edge[r]);
+        }
+        kernels_.subtract_tile(tile, factors, strip_, inner.count());
+        for (int r = 0; aside && r < kTileRows; ++r) std::copy_n(edge[r], columns.count(), places[r]);
+    }
+
+    const quo::DenseKernels& kernels_ = dense_kernels();
+    const Factors& a_;
+    const Matrix& b_;
+    double strip_[kStripRows * kMostColumns];
+};
+
+/** Solves with the triangles of an LU decomposition, for all right-hand sides at once and so that the inner loops
+ * run along rows. Great triangles are halved: what lies outside the halves is a product. */
+template <typename Matrix, typename Result>
+class TriangularSolver {
+public:
+    TriangularSolver(const Matrix& lu, int n, const Result& y)
+        : lu_{lu}, y_{y}, leaf_{leaf_of(n)}, product_{lu, y} {}
+
+    /** y[rows] becomes L^-1 y[rows]. */
+    void lower(Range rows, Range columns) {
+        if (rows.count() > leaf_) {
+            lower(rows.upper_half(), columns);
+            product_.subtract(y_, rows.lower_half(), rows.upper_half(), columns);
+            return lower(rows.lower_half(), columns);
+        }
+        for (int i = rows.first + 1; i < rows.last; ++i) {
+            for (int k = rows.first; k < i; ++k) subtract_row(i, k, columns);
+        }
+    }
+
+    /** y[rows] becomes U^-1 y[rows]. */
+    void upper(Range rows, Range columns) {
+        if (rows.count() > leaf_) {
+            upper(rows.lower_half(), columns);
+            product_.subtract(y_, rows.upper_half(), rows.lower_half(), columns);
+            return upper(rows.upper_half(), columns);
+        }
+        for (int i = rows.last - 1; i >= rows.first; --i) {
+            for (int k = i + 1; k < rows.last; ++k) subtract_row(i, k, columns);
+            const double pivot = lu_[i][i];
+            for (int j = columns.first; j < columns.last; ++j) y_[i][j] /= pivot;
+        }
+    }
+
+private:
+    void subtract_row(int i, int k, Range columns) const {
+        subtract_multiple(y_[i] + columns.first, y_[k] + columns.first, lu_[i][k], columns.count());
+    }
+
+    const Matrix& lu_;
+    const Result& y_;
+    int leaf_;
+    Product<Matrix, Result> product_;
+};
+
+/** Factors a matrix in place with scaled partial pivoting. */
+template <typename Matrix>
+class Factoring {
+public:
+    Factoring(const Matrix& a, int n, double* scale)
+        : a_{a}, n_{n}, scale_{scale}, solver_{a, n, a}, product_{a, a} {}
+
+    /** exchanged[j] becomes the row that stage j swaps with row j. The parity of the exchanges. */
+    double run(int* exchanged) {
+        exchanged_ = exchanged;
+        factor({0, n_});
+        return parity_;
+    }
+
+private:
+    // These columns of the rows from their diagonal on. Many are halved: the left ones first, then the right ones
+    // less what the left ones take from them, in the order of the stages.
+    void factor(Range columns) {
+        if (columns.count() > leaf_of(n_)) {
+            const Range left = columns.upper_half(), right = columns.lower_half();
+            factor(left);
+            solver_.lower(left, right);
+            product_.subtract(a_, {left.last, n_}, left, right);
+            return factor(right);
+        }
+        for (int j = columns.first; j < columns.last; ++j) eliminate(j, columns.last);
+    }
+
+    // Stage j in the columns before `last`, row by row so that the inner loop runs along memory.
+    void eliminate(int j, int last) {
+        const int pivot = scaled_pivot_row(a_, n_, j, scale_);
+        exchanged_[j] = pivot;
+        if (pivot != j) {
+            std::swap_ranges(a_[pivot], a_[pivot] + n_, a_[j]);
+            scale_[pivot] = scale_[j];
+            parity_ = -parity_;
+        }
+        double* top = a_[j];
+        if (top[j] == 0.0) top[j] = kTinyPivot;
+        const double inverse = 1.0 / top[j];
+        for (int i = j + 1; i < n_; ++i) {
+            double* row = a_[i];
+            row[j] *= inverse;
+            subtract_multiple(row + j + 1, top + j + 1, row[j], last - j - 1);
+        }
+    }
+
+    const Matrix& a_;
+    int n_;
+    double* scale_;
+    int* exchanged_ = nullptr;
+    TriangularSolver<Matrix, Matrix> solver_;
+    Product<Matrix, Matrix> product_;
+    double parity_ = 1.0;
+};
+
+// Inverse from the factors. L^-1 has no entry above its diagonal, and its columns change places last, so that much
+// of it can be left out.
 template <typename Matrix, typename Result>
 void invert_from_lu(const Matrix& lu, int n, const int* exchanged, const Result& y) {
     for (int i = 0; i < n; ++i) {
         std::fill_n(y[i], n, 0.0);
         y[i][i] = 1.0;
     }
-    for (int j = 0; j < n; ++j) {
-        if (exchanged[j] != j) std::swap_ranges(y[j], y[j] + n, y[exchanged[j]]);
-    }
-    for (int i = 1; i < n; ++i) {
-        for (int k = 0; k < i; ++k) subtract_multiple(y[i], y[k], lu[i][k], n);
-    }
-    for (int i = n - 1; i >= 0; --i) {
-        for (int k = i + 1; k < n; ++k) subtract_multiple(y[i], y[k], lu[i][k], n);
-        const double pivot = lu[i][i];
-        for (int j = 0; j < n; ++j) y[i][j] /= pivot;
+    TriangularSolver<Matrix, Result> solver{lu, n, y};
+    by_pieces({0, n}, kSmall, [&](Range columns) { solver.lower({columns.first, n}, columns); });
+    solver.upper({0, n}, {0, n});
+    for (int i = 0; i < n; ++i) {
+        for (int j = n - 1; j >= 0; --j) std::swap(y[i][j], y[i][exchanged[j]]);
     }
 }
 
@@ -116,7 +260,7 @@ int tracked_ludcmp(const Matrix& a, int n, int* exchanged, double* parity) {
         quo::say("Singular matrix in lud decomposition");
         return frame.silent(QUO_NUMERIC);
     }
-    *parity = factor_lu(a, n, scale.data(), exchanged);
+    *parity = Factoring<Matrix>{a, n, scale.data()}.run(exchanged);
     return frame.success();
 }
 

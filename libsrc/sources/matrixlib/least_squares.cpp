@@ -1,17 +1,19 @@
 #include <algorithm>
 #include <cmath>
+#include <cstdlib>
 #include <cstring>
 #include <limits>
 #include <utility>
 
 #include "diagnosticslib/call_frame.h"
+#include "matrixlib/dense_kernels.h"
 #include "matrixlib/matrix_kernels.h"
 #include "quo_base/alloc_free.h"
 #include "sarutillib/ground/checked_size.h"
 
 namespace {
 
-using quo::WeightedPoints;
+using quo::dense_kernels, quo::WeightedPoints;
 
 /** The design matrix of the parameters that are fitted, evaluated once: a row per point holds its basis functions,
  * then what is left of the observation when the other parameters' part is taken off, padded to whole panels. */
@@ -179,20 +181,35 @@ int fit_by_normal_equations(const FitName& name, const WeightedPoints& points, d
     return frame.success();
 }
 
-/** Householder QR with column pivoting of a column-major matrix, carrying one right-hand side along. */
+double norm(double* values, std::ptrdiff_t count) {
+    double square = 0.0;
+    dense_kernels().dots(values, {values, count, 1, count}, &square);
+    return std::sqrt(square);
+}
+
+/** Householder QR with column pivoting of a column-major matrix, carrying the right-hand side along as a column
+ * after the others. */
 class PivotedQr {
 public:
-    /** `leads` and `order` have room for a value per column. */
-    PivotedQr(double* columns, double* b, int rows, int cols, double* leads, int* order)
-        : a_{columns}, b_{b}, rows_{rows}, cols_{cols}, leads_{leads}, order_{order} {
+    static std::size_t room(int cols) { return 3 * static_cast<std::size_t>(cols) + 2; }
+    /** `work` holds room() values, `order` one per column. */
+    PivotedQr(double* columns, int rows, int cols, double* work, int* order)
+        : a_{columns},
+          rows_{rows},
+          cols_{cols},
+          leads_{work},
+          squares_{work + cols},
+          factors_{squares_ + cols + 1},
+          order_{order} {
         for (int j = 0; j < cols; ++j) order[j] = j;
     }
 
     /** Decomposes until what is left of every column is below `tolerance` times the first pivot. */
     int run(double tolerance) {
+        for (int j = 0; j <= cols_; ++j) kernels_.dots(column(j), {column(j), rows_, 1, rows_}, &squares_[j]);
         for (rank_ = 0; rank_ < cols_; ++rank_) {
             bring_longest_forward();
-            const double length = norm(column(rank_) + rank_, rows_ - rank_);
+            const double length = std::sqrt(squares_[rank_]);
             if (rank_ == 0) first_ = length;
             if (length <= tolerance * first_) break;
             last_ = length;
@@ -201,10 +218,10 @@ public:
         return rank_;
     }
     [[nodiscard]] double condition() const { return rank_ > 0 ? first_ / last_ : HUGE_VAL; }
-    [[nodiscard]] double residual_norm() const { return norm(b_ + rank_, rows_ - rank_); }
+    [[nodiscard]] double residual_norm() const { return std::sqrt(squares_[cols_]); }
 
     /** Parameters by back substitution; those of dependent columns are 0. */
-    void solve(double* x) const { solve_upper(b_, x); }
+    void solve(double* x) const { solve_upper(column(cols_), x); }
     /** The same for another right-hand side that has been through the reflections. */
     void solve_upper(const double* b, double* x) const {
         std::fill_n(x, cols_, 0.0);
@@ -231,153 +248,137 @@ public:
         for (int k = rank_ - 1; k >= 0; --k) reflect(k, v);
     }
 
-    static double norm(const double* v, int n) {
-        double sum = 0.0;
-        for (int i = 0; i < n; ++i) sum += v[i] * v[i];
-        return std::sqrt(sum);
-    }
-
 private:
     [[nodiscard]] double* column(int j) const { return a_ + static_cast<std::ptrdiff_t>(j) * rows_; }
 
     void bring_longest_forward() {
-        int best = rank_;
-        double longest = -1.0;
-        for (int j = rank_; j < cols_; ++j) {
-            const double length = norm(column(j) + rank_, rows_ - rank_);
-            if (length > longest) {
-                longest = length;
-                best = j;
-            }
-        }
+        const auto best = static_cast<int>(std::max_element(squares_ + rank_, squares_ + cols_) - squares_);
         if (best == rank_) return;
         std::swap_ranges(column(best), column(best) + rows_, column(rank_));
+        std::swap(squares_[best], squares_[rank_]);
         std::swap(order_[best], order_[rank_]);
     }
 
     // The reflection that turns the pivot column into a multiple of the unit vector; R's element takes its place.
     void reflect_the_rest(double length) {
         double* pivot = column(rank_) + rank_;
-        const int n = rows_ - rank_;
         const double diagonal = -std::copysign(length, pivot[0]);
-        pivot[0] -= diagonal;
-        const double half_square = -diagonal * pivot[0];
-        for (int j = rank_ + 1; j < cols_; ++j) apply(pivot, half_square, column(j) + rank_, n);
-        apply(pivot, half_square, b_ + rank_, n);
-        leads_[rank_] = std::exchange(pivot[0], diagonal);
+        leads_[rank_] = pivot[0] - diagonal;
+        pivot[0] = diagonal;
+        apply(rank_, {column(rank_ + 1), rows_, cols_ - rank_, rows_});
+    }
+    // One reflection again.
+    void reflect(int k, double* v) const { apply(k, {v, rows_, 1, rows_}); }
+
+    // Reflection k: its vector stands below the diagonal, the first element among the leads. The squares of what
+    // it leaves below row k are noted, for the columns that are still to be decomposed.
+    void apply(int k, const quo::Columns& columns) const {
+        const double *const below = column(k) + k + 1, lead = leads_[k], half_square = -column(k)[k] * lead;
+        double *const top = columns.first + k, *const squares = squares_ + cols_ + 1 - columns.count;
+        const quo::Columns rest{top + 1, rows_, columns.count, rows_ - k - 1};
+        kernels_.dots(below, rest, factors_);
+        for (int j = 0; j < columns.count; ++j) {
+            double& first = top[static_cast<std::ptrdiff_t>(j) * rows_];
+            factors_[j] = (factors_[j] + lead * first) / half_square;
+            first -= factors_[j] * lead;
+        }
+        kernels_.subtract_multiples(below, factors_, rest, squares);
     }
 
-    // One reflection again: its vector stands below the diagonal, the first element among the leads.
-    void reflect(int k, double* v) const {
-        const double *const rest = column(k) + k + 1, lead = leads_[k];
-        double* const below = v + k + 1;
-        const int n = rows_ - k - 1;
-        double sum = lead * v[k];
-        for (int i = 0; i < n; ++i) sum += rest[i] * below[i];
-        const double factor = sum / (-column(k)[k] * lead);
-        v[k] -= factor * lead;
-        quo::subtract_multiple(below, rest, factor, n);
-    }
-
-    static void apply(const double* u, double half_square, double* v, int n) {
-        double sum = 0.0;
-        for (int i = 0; i < n; ++i) sum += u[i] * v[i];
-        quo::subtract_multiple(v, u, sum / half_square, n);
-    }
-
-    double *a_, *b_;
+    const quo::DenseKernels& kernels_ = dense_kernels();
+    double* a_;
     int rows_, cols_;
-    double* leads_;
+    double *leads_, *squares_, *factors_;
     int* order_;
     int rank_ = 0;
     double first_ = 0.0, last_ = 0.0;
 };
 
-/** Corrects a solution and its residual together by what they leave of r + A x = b and A^T r = 0, in extended
- * precision: large residuals cost a solution as many digits as the square of the condition has, and get them back
- * so (A. Bjorck, "Iterative refinement of linear least squares solutions I", BIT 7, 1967). */
+/** Corrects a solution and its residual together by what they leave of r + A x = b and A^T r = 0, summed with
+ * twice the digits: large residuals cost a solution as many digits as the square of the condition has, and get
+ * them back so (A. Bjorck, "Iterative refinement of linear least squares solutions I", BIT 7, 1967). */
 class Refinement {
 public:
     static std::size_t room(int rows, int cols) {
         return 2 * static_cast<std::size_t>(rows) + 3 * static_cast<std::size_t>(cols);
     }
-    /** `a` is the column-major matrix that `qr` has decomposed; `work` holds room() values. */
-    Refinement(const PivotedQr& qr, const double* a, const double* b, int rows, int cols, double* work)
+    /** `a` is the column-major matrix that `qr` has decomposed, and the right-hand side; `work` holds room()
+     * values, all 0. */
+    Refinement(const PivotedQr& qr, double* a, int rows, int cols, double* work)
         : qr_{qr},
-          a_{a},
-          b_{b},
-          rows_{rows},
-          cols_{cols},
+          a_{a, rows, cols, rows},
+          b_{a + static_cast<std::ptrdiff_t>(cols) * rows},
           residual_{work},
           change_{work + rows},
           gradient_{change_ + rows},
           lower_{gradient_ + cols},
           step_{lower_ + cols} {}
 
-    /** Steps are taken while each is far shorter than the one before. For matrices of full rank. */
+    /** Steps are taken while each is far shorter than the one before, and until the next, shorter again by as
+     * much, would be lost in every parameter. For matrices of full rank. */
     void run(double* x) {
         constexpr int kMostSteps = 4;
-        std::fill_n(residual_, rows_, 0.0);
-        for (int i = 0; i < rows_; ++i) residual_[i] = left_over(x, i);
-        double before = PivotedQr::norm(x, cols_);
+        constexpr double kHalfDigit = 0x1p-54;
+        kernels_.long_residual(a_, x, b_, residual_, residual_, change_);
+        double before = norm(x, a_.count);
         for (int k = 0; k < kMostSteps; ++k) {
-            find_step(x);
-            const double length = PivotedQr::norm(step_, cols_);
+            find_step();
+            const double length = norm(step_, a_.count);
             if (!(length < 0.25 * before)) return;
+            double smallest = HUGE_VAL;
+            for (int j = 0; j < a_.count; ++j) smallest = std::min(smallest, std::abs(x[j] += step_[j]));
+            for (std::ptrdiff_t i = 0; i < a_.length; ++i) residual_[i] += change_[i];
+            if (length * (length / before) <= kHalfDigit * smallest) return;
             before = length;
-            for (int j = 0; j < cols_; ++j) x[j] += step_[j];
-            for (int i = 0; i < rows_; ++i) residual_[i] += change_[i];
+            kernels_.long_residual(a_, x, b_, residual_, change_, nullptr);
         }
     }
-    [[nodiscard]] double residual_norm() const { return PivotedQr::norm(residual_, rows_); }
+    [[nodiscard]] double residual_norm() const { return norm(residual_, a_.length); }
 
 private:
-    using Extended = long double;
-
-    // b - A x less the residual at hand, at one point.
-    [[nodiscard]] double left_over(const double* x, int i) const {
-        Extended sum = Extended{b_[i]} - residual_[i];
-        for (std::ptrdiff_t j = 0; j < cols_; ++j) sum -= Extended{a_[j * rows_ + i]} * x[j];
-        return static_cast<double>(sum);
-    }
-    void find_step(const double* x) {
-        for (int i = 0; i < rows_; ++i) change_[i] = left_over(x, i);
-        for (std::ptrdiff_t j = 0; j < cols_; ++j) {
-            Extended sum = 0.0;
-            for (std::ptrdiff_t i = 0; i < rows_; ++i) sum -= Extended{a_[j * rows_ + i]} * residual_[i];
-            gradient_[j] = static_cast<double>(sum);
-        }
+    // From what is left of the first equation, which stands in change_ and becomes the residual's change.
+    void find_step() {
+        for (int j = 0; j < a_.count; ++j)
+            gradient_[j] = -kernels_.long_dot(a_.first + j * a_.distance, residual_, a_.length);
         qr_.solve_lower(gradient_, lower_);
         qr_.reflect_forward(change_);
-        for (int j = 0; j < cols_; ++j) change_[j] -= lower_[j];
+        for (int j = 0; j < a_.count; ++j) change_[j] -= lower_[j];
         qr_.solve_upper(change_, step_);
-        std::copy_n(lower_, cols_, change_);
+        std::copy_n(lower_, a_.count, change_);
         qr_.reflect_backward(change_);
     }
 
+    const quo::DenseKernels& kernels_ = dense_kernels();
     const PivotedQr& qr_;
-    const double *a_, *b_;
-    int rows_, cols_;
+    quo::Columns a_;
+    const double* b_;
     double *residual_, *change_, *gradient_, *lower_, *step_;
 };
 
-bool all_finite(const double* values, std::size_t count) {
-    return std::all_of(values, values + count, [](double value) { return std::isfinite(value); });
+// Multiplies a column by a power of two, so that nothing is rounded.
+void scale(double* column, std::ptrdiff_t rows, int exponent) {
+    const double factor = std::ldexp(1.0, exponent);
+    for (std::ptrdiff_t i = 0; i < rows; ++i) column[i] *= factor;
 }
 
-// The columns of `a`, scaled by powers of two to lengths of about 1, so that nothing is rounded.
-void scale_columns(const double* a, int rows, int cols, double* columns, int* exponents) {
-    for (std::ptrdiff_t j = 0; j < cols; ++j) {
-        double largest = 0.0;
-        for (std::ptrdiff_t i = 0; i < rows; ++i) largest = std::max(largest, std::abs(a[i * cols + j]));
-        std::frexp(largest, &exponents[j]);
+// The columns of `a`, and `b` after them, scaled to lengths of about 1. False where a value is not finite.
+bool scale_columns(const double* a, const double* b, int rows, int cols, double* columns, int* exponents) {
+    constexpr int kSquareFits = 400, kMost = 1000;  // 2^1000 is a number, and so is its inverse
+    Transpose_Matrix(a, columns, rows, cols);
+    std::copy_n(b, rows, columns + static_cast<std::ptrdiff_t>(cols) * rows);
+    for (std::ptrdiff_t j = 0; j <= cols; ++j) {
         double* column = columns + j * rows;
-        for (std::ptrdiff_t i = 0; i < rows; ++i) column[i] = std::ldexp(a[i * cols + j], -exponents[j]);
+        const double largest = dense_kernels().largest(column, rows);
+        if (!std::isfinite(largest)) return false;
+        std::frexp(largest, &exponents[j]);
+        exponents[j] = std::abs(exponents[j]) < kSquareFits ? 0 : std::clamp(exponents[j], -kMost, kMost);
+        if (exponents[j] != 0) scale(column, rows, -exponents[j]);
         int length_exponent = 0;
-        std::frexp(PivotedQr::norm(column, rows), &length_exponent);
-        for (std::ptrdiff_t i = 0; i < rows; ++i) column[i] = std::ldexp(column[i], -length_exponent);
+        std::frexp(norm(column, rows), &length_exponent);
+        scale(column, rows, -length_exponent);
         exponents[j] += length_exponent;
     }
+    return true;
 }
 
 }  // namespace
@@ -400,31 +401,28 @@ int lsq_fit(const double* a, int rows, int cols, const double* b, double* x, Lsq
     quo::CallFrame frame{"lsq_fit", quo::kMatrixSource};
     if (cols < 1 || rows < cols)
         return frame.fail(QUO_NUMERIC, "A fit needs at least as many points as parameters");
-    const auto elements = static_cast<std::size_t>(rows) * static_cast<std::size_t>(cols);
-    if (!all_finite(a, elements) || !all_finite(b, static_cast<std::size_t>(rows))) {
-        return frame.fail(QUO_NUMERIC, "A value to fit is not finite");
-    }
-    const auto parameters = static_cast<std::size_t>(cols), points = static_cast<std::size_t>(rows);
+    const auto parameters = static_cast<std::size_t>(cols),
+               elements = static_cast<std::size_t>(rows) * (parameters + 1);
     quo::TrackedBuffer<double> columns{elements}, scaled{elements};
-    quo::TrackedBuffer<double> work{points + parameters + Refinement::room(rows, cols)};
-    quo::TrackedBuffer<int> places{2 * parameters};
+    quo::TrackedBuffer<double> work{PivotedQr::room(cols) + Refinement::room(rows, cols)};
+    quo::TrackedBuffer<int> places{2 * parameters + 1};
     if (!columns || !scaled || !work || !places) return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
 
-    double *const right = work.data(), *const leads = right + rows;
     int* const exponents = places.data() + cols;
-    scale_columns(a, rows, cols, scaled.data(), exponents);
+    if (!scale_columns(a, b, rows, cols, scaled.data(), exponents))
+        return frame.fail(QUO_NUMERIC, "A value to fit is not finite");
     std::copy_n(scaled.data(), elements, columns.data());
-    std::copy_n(b, rows, right);
-    PivotedQr qr{columns.data(), right, rows, cols, leads, places.data()};
+    PivotedQr qr{columns.data(), rows, cols, work.data(), places.data()};
     LsqSummary found{
         .rank = qr.run(rows * 0x1p-52), .condition = qr.condition(), .residual_norm = qr.residual_norm()};
     qr.solve(x);
     if (found.rank == cols) {
-        Refinement refinement{qr, scaled.data(), b, rows, cols, leads + cols};
+        Refinement refinement{qr, scaled.data(), rows, cols, work.data() + PivotedQr::room(cols)};
         refinement.run(x);
         found.residual_norm = refinement.residual_norm();
     }
-    for (int j = 0; j < cols; ++j) x[j] = std::ldexp(x[j], -exponents[j]);
+    for (int j = 0; j < cols; ++j) x[j] = std::ldexp(x[j], exponents[cols] - exponents[j]);
+    found.residual_norm = std::ldexp(found.residual_norm, exponents[cols]);
     if (summary) *summary = found;
     return frame.success();
 }

@@ -56,12 +56,19 @@ struct Request {
 };
 
 /** Null when there is no such plan to be had. */
-FftEnginePlan* open(quo::FftEngine& engine, const FftGeometry& geometry) noexcept try {
-    const quo::ErrnoKept kept;
-    return quo::plan_store().open(engine, geometry);
-} catch (...) {
-    quo::note_fft_error(engine, geometry.length, {.bytes = sizeof geometry});  // of the store's own
-    return nullptr;
+FftEnginePlan* open(const FftGeometry& geometry) noexcept {
+    quo::FftEngine* const engine = quo::fft_engine(geometry.length);
+    if (!engine) {
+        quo::note_no_fft_engine();
+        return nullptr;
+    }
+    try {
+        const quo::ErrnoKept kept;
+        return quo::plan_store().open(*engine, geometry);
+    } catch (...) {
+        quo::note_fft_error(*engine, geometry.length, {.bytes = sizeof geometry});  // of the store's own
+        return nullptr;
+    }
 }
 
 void close(const FftEnginePlan* handle) {
@@ -69,14 +76,8 @@ void close(const FftEnginePlan* handle) {
 }
 
 int open_axes(FftPlan& made, const Axis& rows, const Axis& columns) {
-    if (!rows.wanted() && !columns.wanted()) return QUO_OK;
-    quo::FftEngine* const engine = quo::fft_engine();
-    if (!engine) {
-        quo::note_no_fft_engine();
-        return rows.wanted() ? kNoRows : kNoColumns;
-    }
-    if (rows.wanted() && !(made.rows = open(*engine, rows.geometry))) return kNoRows;
-    if (columns.wanted() && !(made.columns = open(*engine, columns.geometry))) {
+    if (rows.wanted() && !(made.rows = open(rows.geometry))) return kNoRows;
+    if (columns.wanted() && !(made.columns = open(columns.geometry))) {
         close(made.rows);
         return kNoColumns;
     }
@@ -187,7 +188,7 @@ int first_smooth(int first, std::int64_t step) {
 extern "C" {
 
 const char* fft_engine_name(void) noexcept {
-    const quo::FftEngine* engine = quo::fft_engine();
+    const quo::FftEngine* engine = quo::fft_engine(2);  // of the lengths that every engine takes
     return engine ? engine->name() : "none";
 }
 

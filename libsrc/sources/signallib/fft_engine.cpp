@@ -10,6 +10,7 @@
 
 #include "diagnosticslib/errno_kept.h"
 #include "sarutillib/ground/bounded_text.h"
+#include "signallib/own_fft/fft_plans.h"
 
 #if defined(__x86_64__) || defined(__i386__)
 #include <cpuid.h>
@@ -47,7 +48,7 @@ FftEngine* open_module(const std::string& file) {
 /** Folder of the library or program that holds this code, with a slash; empty where it cannot be told. */
 std::string own_folder() {
     Dl_info info{};
-    if (!dladdr(reinterpret_cast<const void*>(&fft_engine), &info) || !info.dli_fname) return {};
+    if (!dladdr(reinterpret_cast<const void*>(&note_no_fft_engine), &info) || !info.dli_fname) return {};
     const std::string file = info.dli_fname;
     return file.substr(0, file.rfind('/') + 1);  // a name without a slash gives an empty one
 }
@@ -56,7 +57,16 @@ FftEngine* mkl() { return load_mkl_engine(setting("QUO_MKL_LIBRARY")); }
 FftEngine* fftw() { return load_fftw_engine(setting("QUO_FFTW_MODULE")); }
 
 std::mutex choosing;
-std::atomic<FftEngine*> chosen{nullptr};
+/** For the lengths that our own engine does not take, and for those that it does. */
+std::atomic<FftEngine*> chosen[2];
+
+FftEngine* first_to_take(int length) {
+    const char* choice = setting("QUO_FFT_ENGINE");
+    for (const auto load : engine_order(choice ? choice : "auto", is_makers_processor()))
+        if (FftEngine* const engine = load ? load() : nullptr)
+            if (engine->takes(length)) return engine;
+    return nullptr;
+}
 
 /** Of each thread, as errno is: the plans of two threads may fail at the same time. */
 thread_local char error_text[512];
@@ -74,33 +84,32 @@ FftEngine* load_fftw_engine(const char* file) noexcept try {
 }
 
 EngineOrder engine_order(std::string_view choice, bool makers_processor) noexcept {
-    if (choice == "mkl") return {mkl, nullptr};
-    if (choice == "fftw") return {fftw, nullptr};
-    return makers_processor ? EngineOrder{mkl, fftw} : EngineOrder{fftw, mkl};
+    if (choice == "mkl") return {mkl};
+    if (choice == "fftw") return {fftw};
+    if (choice == "quo") return {load_own_engine};
+    return makers_processor ? EngineOrder{mkl, load_own_engine, fftw} : EngineOrder{load_own_engine, fftw, mkl};
 }
 
-FftEngine* fft_engine() noexcept {
-    if (FftEngine* const engine = chosen) return engine;
+FftEngine* fft_engine(int length) noexcept {
+    std::atomic<FftEngine*>& known = chosen[is_own_fft_length(length) ? 1 : 0];
+    if (FftEngine* const engine = known) return engine;
     const std::lock_guard guard{choosing};
-    if (FftEngine* const engine = chosen) return engine;
+    if (FftEngine* const engine = known) return engine;
     const ErrnoKept kept;
-    const char* choice = setting("QUO_FFT_ENGINE");
-    const EngineOrder order = engine_order(choice ? choice : "auto", is_makers_processor());
-    FftEngine* engine = order.first();
-    if (!engine && order.second) engine = order.second();
-    return chosen = engine;
+    return known = first_to_take(length);
 }
 
-void forget_fft_engine() noexcept { chosen = nullptr; }
+void forget_fft_engine() noexcept { chosen[0] = chosen[1] = nullptr; }
 
 void forget_fft_error() noexcept { error_text[0] = '\0'; }
 
 void note_no_fft_engine() noexcept {
     copy_bounded(
         error_text,
-        "no FFT engine can be loaded: install libquo_base_fftw.so beside the library in quo_base/, or name "
-        "it in QUO_FFTW_MODULE; or install MKL (libmkl_rt.so, in Debian the package libmkl-rt), or name it "
-        "in QUO_MKL_LIBRARY. QUO_FFT_ENGINE chooses: auto, mkl or fftw");
+        "no FFT engine can be loaded that does transforms of this length: install libquo_base_fftw.so beside the "
+        "library in quo_base/, or name it in QUO_FFTW_MODULE; or install MKL (libmkl_rt.so, in Debian the package "
+        "libmkl-rt), or name it in QUO_MKL_LIBRARY. QUO_FFT_ENGINE chooses: auto, mkl, fftw or quo, which takes "
+        "lengths without a prime factor above 7");
 }
 
 void note_fft_error(const FftEngine& engine, int length, const FftFailure& why) noexcept {

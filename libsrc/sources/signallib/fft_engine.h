@@ -1,6 +1,7 @@
 #ifndef QUO_FFT_ENGINE_H
 #define QUO_FFT_ENGINE_H
 
+#include <array>
 #include <cstddef>
 #include <memory>
 #include <string_view>
@@ -46,7 +47,7 @@ public:
     virtual bool run(const float* in, float* out, FftFailure& why) noexcept = 0;
 };
 
-/** What computes the transforms. Loaded at run time, lives until the process ends. */
+/** What computes the transforms. Lives until the process ends. */
 class FftEngine {
 public:
     FftEngine() = default;
@@ -55,8 +56,14 @@ public:
     virtual ~FftEngine() = default;
 
     [[nodiscard]] virtual const char* name() const noexcept = 0;
-    /** Columns of so many rows and more are faster through a tile of neighbouring columns. */
-    [[nodiscard]] virtual int tiled_from() const noexcept = 0;
+    /** Whether transforms of a length are its business. */
+    [[nodiscard]] virtual bool takes(int length) const noexcept { return length > 0; }
+    /** Whether it transforms real data by itself. */
+    [[nodiscard]] virtual bool takes_real() const noexcept { return false; }
+    /** Whether columns are faster through a tile of neighbouring ones. */
+    [[nodiscard]] virtual bool wants_tile(const FftGeometry& columns) const noexcept {
+        return columns.length == 0;
+    }
     /** Null when the batch cannot be had, which fills `why`. Takes memory of its own to measure on. Any thread may
      * ask. */
     [[nodiscard]] virtual std::unique_ptr<FftBatch> make(const FftGeometry& geometry,
@@ -67,7 +74,7 @@ public:
 
 /** The module's only exported function. Null for another version of the interface than its own. */
 using FftwEntry = FftEngine* (*)(int interface_version);
-inline constexpr int kFftInterfaceVersion = 2;
+inline constexpr int kFftInterfaceVersion = 3;
 inline constexpr const char* kFftwEntryName = "quo_base_fftw_engine";
 
 /** Loads the module: from `file`, or where that is null from the folder of this library, quo_base/ below it first.
@@ -79,19 +86,21 @@ inline constexpr const char* kFftwEntryName = "quo_base_fftw_engine";
 /** Loads MKL: from `file`, or where that is null by its usual names. Null when it cannot be loaded. */
 [[nodiscard]] FftEngine* load_mkl_engine(const char* file) noexcept;
 
+// ---- Our own engine ----
+
+/** Takes lengths without a prime factor above 7. Null without memory. */
+[[nodiscard]] FftEngine* load_own_engine() noexcept;
+
 // ---- The choice ----
 
 /** Which engine to try first, and which next; null ends the list. */
-struct EngineOrder {
-    FftEngine* (*first)();
-    FftEngine* (*second)();
-};
-/** `choice` is the value of QUO_FFT_ENGINE; anything but "mkl" and "fftw" counts as "auto". */
+using EngineOrder = std::array<FftEngine* (*)(), 3>;
+/** `choice` is the value of QUO_FFT_ENGINE; anything but "mkl", "fftw" and "quo" counts as "auto". */
 [[nodiscard]] EngineOrder engine_order(std::string_view choice, bool makers_processor) noexcept;
 
-/** The engine of the process, chosen at the first call; null where none can be loaded. As long as there is none,
- * each call tries again. */
-[[nodiscard]] FftEngine* fft_engine() noexcept;
+/** The engine of the process for transforms of a length, chosen at the first call: one for lengths that our own
+ * engine takes, one for others. Null where none can be loaded. As long as there is none, each call tries again. */
+[[nodiscard]] FftEngine* fft_engine(int length) noexcept;
 
 /** What fft_engine_error() tells this thread: nothing, that no engine can be loaded, or why `engine` could not do
  * with transforms of a length. */

@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <bit>
 #include <cstring>
-#include <tuple>
 #include <utility>
 
 #include "quo_base/fft.h"
@@ -15,7 +14,7 @@ namespace {
 
 /** Rows that are run together: enough for the engine to batch, and in the second cache several times over. */
 constexpr std::ptrdiff_t kRowBlockBytes = 128 << 10;
-/** Samples of a group of columns: bounds what measuring a strided batch costs. */
+/** Samples of a group of columns: long ones are multiplied while they are in some cache. */
 constexpr int kGroupSamples = 1 << 21;
 constexpr int kLine = 16;  ///< groups of columns are multiples of whole cache lines
 
@@ -85,23 +84,12 @@ public:
             const int width = std::min(block_, geometry_.count - k);
             const auto offset = k * geometry_.distance * floats_of(geometry_.domain);
             if (!batches_.run(width, in + offset, out + offset)) return false;
-            multiply(out + offset, width, factors);
+            multiply_batch(geometry_, out + offset, width, factors);
         }
         return true;
     }
 
 private:
-    void multiply(float* data, int width, FftFactors factors) const noexcept {
-        const auto floats = floats_of(geometry_.domain);
-        const auto [rows, samples, pitch] =
-            geometry_.stride == 1
-                ? std::tuple<std::ptrdiff_t, std::ptrdiff_t, std::ptrdiff_t>{width, geometry_.length,
-                                                                             geometry_.distance}
-                : std::tuple<std::ptrdiff_t, std::ptrdiff_t, std::ptrdiff_t>{geometry_.length, width,
-                                                                             geometry_.stride};
-        multiply_rows(data, rows, samples * floats, pitch * floats, factors);
-    }
-
     BlockBatches batches_;
 };
 
@@ -195,9 +183,18 @@ void multiply_rows(float* data, std::ptrdiff_t rows, std::ptrdiff_t floats, std:
         for (std::ptrdiff_t k = 0; k < floats; ++k) data[k] = data[k] * factors.first * factors.second;
 }
 
+void multiply_batch(const FftGeometry& batch, float* data, int count, FftFactors factors) noexcept {
+    const auto floats = floats_of(batch.domain);
+    if (batch.stride == 1)
+        multiply_rows(data, count, batch.length * floats, batch.distance * floats, factors);
+    else
+        multiply_rows(data, batch.length, count * floats, batch.stride * floats, factors);
+}
+
 std::unique_ptr<FftTransform> make_fft_transform(FftEngine& engine, const FftGeometry& geometry) {
     const bool columns = geometry.stride != 1;
-    if (columns && geometry.domain == FftDomain::Complex && geometry.length >= engine.tiled_from())
+    if (geometry.domain == FftDomain::Real && !engine.takes_real()) return make_packed_real(engine, geometry);
+    if (columns && geometry.domain == FftDomain::Complex && engine.wants_tile(geometry))
         return if_ready(std::make_unique<TiledColumns>(engine, geometry, tile_width(geometry.length)));
     const int block = columns ? column_block(geometry) : row_block(geometry);
     return if_ready(std::make_unique<BlockedTransform>(engine, geometry, block));

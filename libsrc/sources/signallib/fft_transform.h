@@ -49,6 +49,12 @@ protected:
 void multiply_rows(float* data, std::ptrdiff_t rows, std::ptrdiff_t floats, std::ptrdiff_t pitch,
                    FftFactors factors) noexcept;
 
+/** The same for `count` transforms of a batch. */
+void multiply_batch(const FftGeometry& batch, float* data, int count, FftFactors factors) noexcept;
+
+/** Real transforms by an engine that does complex ones only. */
+[[nodiscard]] std::unique_ptr<FftTransform> make_packed_real(FftEngine& engine, const FftGeometry& geometry);
+
 }  // namespace quo
 
 #endif

@@ -33,7 +33,6 @@ enum Parameter : int {
 enum Value : int {
     kComplex = 32,
     kReal = 33,
-    kSingle = 35,
     kComplexReal = 40,
     kInPlace = 43,
     kNotInPlace = 44,
@@ -44,7 +43,7 @@ constexpr int kSequential = 1;
 /** The functions in use. The dots belong to the types: callers of a variadic function announce how many vector
  * registers hold arguments, and the library relies on it. */
 struct Dfti {
-    MklLong (*create)(Descriptor*, int precision, int domain, MklLong dimensions, ...);
+    MklLong (*create)(Descriptor*, int domain, MklLong length);
     MklLong (*set)(Descriptor, int parameter, ...);
     MklLong (*commit)(Descriptor);
     MklLong (*forward)(Descriptor, void*, ...);
@@ -63,7 +62,7 @@ public:
     [[nodiscard]] MklLong commit() {
         const bool real = geometry_.domain == FftDomain::Real;
         if (const MklLong status =
-                dfti_.create(&descriptor_, kSingle, real ? kReal : kComplex, 1L, MklLong{geometry_.length})) {
+                dfti_.create(&descriptor_, real ? kReal : kComplex, MklLong{geometry_.length})) {
             descriptor_ = nullptr;
             return status;
         }
@@ -126,14 +125,19 @@ public:
         int (*set_threading_layer)(int) = nullptr;
         // Before DFTI is first called: the library must start no threads.
         if (find("MKL_Set_Threading_Layer", set_threading_layer)) set_threading_layer(kSequential);
-        return find("DftiCreateDescriptor", dfti_.create) && find("DftiSetValue", dfti_.set) &&
+        return find("DftiCreateDescriptor_s_1d", dfti_.create) && find("DftiSetValue", dfti_.set) &&
                find("DftiCommitDescriptor", dfti_.commit) && find("DftiComputeForward", dfti_.forward) &&
                find("DftiComputeBackward", dfti_.backward) && find("DftiFreeDescriptor", dfti_.free);
     }
 
     [[nodiscard]] const char* name() const noexcept override { return "mkl"; }
-    // Shorter columns it blocks better by itself.
-    [[nodiscard]] int tiled_from() const noexcept override { return 4096; }
+    [[nodiscard]] bool takes_real() const noexcept override { return true; }
+    // Other columns it blocks better by itself: in long ones whose rows lie whole pages apart it meets but a few
+    // lines of the cache.
+    [[nodiscard]] bool wants_tile(const FftGeometry& columns) const noexcept override {
+        constexpr std::ptrdiff_t kLongColumn = 4096, kPageSamples = 4096 / (2 * sizeof(float));
+        return columns.length >= kLongColumn && columns.stride % kPageSamples == 0;
+    }
     [[nodiscard]] std::unique_ptr<FftBatch> make(const FftGeometry& geometry, FftFailure& why) noexcept override {
         // MKL answers when memory is short, but not where the system promises more than it has.
         const MemoryNeed need = most_memory(geometry);

@@ -32,24 +32,30 @@ std::optional<int> index_of(std::string_view text, int otherwise) {
 }
 
 // 8-bit samples, which the library's typed access leaves to its callers; they have no byte order.
-void widen(const signed char* from, std::size_t count, double* to) { std::copy_n(from, count, to); }
-void widen(const signed char* from, std::size_t count, float* to) { std::copy_n(from, count, to); }
+double widened(char part) { return static_cast<signed char>(part); }
 template <typename T>
-void widen(const signed char* from, std::size_t count, std::complex<T>* to) {
-    for (std::size_t i = 0; i < count; ++i) to[i] = {static_cast<T>(from[2 * i]), static_cast<T>(from[2 * i + 1])};
+void widen(const std::vector<char>& from, T* to) {
+    std::ranges::transform(from, to, [](char part) { return static_cast<T>(widened(part)); });
+}
+template <typename T>
+void widen(const std::vector<char>& from, std::complex<T>* to) {
+    widen(from, reinterpret_cast<T*>(to));
 }
 
-signed char narrowed(double value) {
-    return static_cast<signed char>(std::isnan(value) ? 0.0 : std::clamp(std::round(value), -128.0, 127.0));
+char narrowed(double value) {
+    return static_cast<char>(std::isnan(value) ? 0.0 : std::clamp(std::round(value), -128.0, 127.0));
 }
-void narrow(const double* from, std::size_t count, signed char* to) {
-    std::transform(from, from + count, to, narrowed);
+void narrow(const double* from, std::vector<char>& to) {
+    std::transform(from, from + to.size(), to.begin(), narrowed);
 }
-void narrow(const dcomplex* from, std::size_t count, signed char* to) {
-    for (std::size_t i = 0; i < count; ++i) {
-        to[2 * i] = narrowed(from[i].real());
-        to[2 * i + 1] = narrowed(from[i].imag());
-    }
+void narrow(const dcomplex* from, std::vector<char>& to) { narrow(reinterpret_cast<const double*>(from), to); }
+
+void go_to(BufferFile& file, std::int64_t offset) {
+    file.seek(offset - file.tell(), BufferFile::FROM_CURRENT);  // from the start, a seek to 0 does nothing
+}
+
+std::size_t stored_size(const RasterDescription& raster, const Tile& tile) {
+    return tile.size() * static_cast<std::size_t>(raster.element_sizeof());
 }
 
 bool is_narrow(const RasterDescription& raster) { return raster.CellType >= INT8_COMPLEX; }
@@ -188,9 +194,21 @@ void RasterReader::fail() const {
     throw Failure(name_ + ": cannot be read: " + cause_of(file_));
 }
 
-void RasterReader::read_bytes(std::int64_t offset, char* to, std::int64_t bytes) {
-    file_.seek(offset - file_.tell(), BufferFile::FROM_CURRENT);  // from the start, a seek to 0 does nothing
-    if (file_.read(to, static_cast<int>(bytes)) != bytes) fail();
+void RasterReader::read(const Tile& tile, char* to) {
+    // Parts of lines that are nearer to each other are read together with what lies between.
+    constexpr std::int64_t kSmallGap = 4096, kAtOnce = 1 << 19;
+    const std::int64_t distance = sample_offset(file_, 1, 0) - sample_offset(file_, 0, 0);
+    const auto part = static_cast<std::int64_t>(tile.samples) * file_.element_sizeof();
+    const int most =
+        distance - part > kSmallGap ? 1 : static_cast<int>(std::max(kAtOnce / distance, std::int64_t{1}));
+    for (int line = 0; line < tile.lines; line += most) {
+        const int lines = std::min(most, tile.lines - line);
+        const std::int64_t bytes = (lines - 1) * distance + part;
+        lines_.resize(static_cast<std::size_t>(bytes));
+        go_to(file_, sample_offset(file_, tile.first_line + line, tile.first_sample));
+        if (file_.read(lines_.data(), static_cast<int>(bytes)) != bytes) fail();
+        for (int i = 0; i < lines; ++i, to += part) std::copy_n(lines_.data() + i * distance, part, to);
+    }
 }
 
 template <typename T>
@@ -210,13 +228,9 @@ void RasterReader::read(const Tile& tile, T* to) {
         if (file_.status() != QUO_OK) fail();
         return;
     }
-    const auto samples = static_cast<std::size_t>(tile.samples);
-    narrow_.resize(samples * static_cast<std::size_t>(file_.element_sizeof()));
-    for (int line = 0; line < tile.lines; ++line) {
-        read_bytes(sample_offset(file_, tile.first_line + line, tile.first_sample),
-                   reinterpret_cast<char*>(narrow_.data()), static_cast<std::int64_t>(narrow_.size()));
-        widen(narrow_.data(), samples, to + static_cast<std::size_t>(line) * samples);
-    }
+    narrow_.resize(stored_size(file_, tile));
+    read(tile, narrow_.data());
+    widen(narrow_, to);
 }
 template void RasterReader::read(const Tile&, float*);
 template void RasterReader::read(const Tile&, double*);
@@ -240,9 +254,21 @@ void NewRaster::fail() const {
     throw Failure(name_ + ": cannot be written: " + cause_of(file_));
 }
 
-void NewRaster::write_bytes(std::int64_t offset, const char* from, std::int64_t bytes) {
-    file_.seek(offset - file_.tell(), BufferFile::FROM_CURRENT);
-    if (file_.write(from, static_cast<int>(bytes)) != bytes) fail();
+void NewRaster::write(const Tile& tile, const char* from) {
+    const bool together = tile.samples == file_.NrOfPixelsPerLine && file_.RowPrefix == 0;
+    const int parts = together ? 1 : tile.lines, bytes = static_cast<int>(stored_size(file_, tile)) / parts;
+    for (int line = 0; line < parts; ++line, from += bytes) {
+        go_to(file_, sample_offset(file_, tile.first_line + line, tile.first_sample));
+        if (file_.write(from, bytes) != bytes) fail();
+    }
+}
+
+void NewRaster::copy_bytes(std::int64_t offset, RasterReader& from, std::int64_t from_offset, std::int64_t bytes) {
+    go_to(from.file_, from_offset);
+    go_to(file_, offset);
+    const int status = file_.copyFrom(from.file_, bytes);
+    if (status == QUO_READ_FAILED) from.fail();
+    if (status != QUO_OK) fail();
 }
 
 template <typename T>
@@ -250,14 +276,9 @@ void NewRaster::write(const Tile& tile, const T* from) {
     if constexpr (std::is_same_v<T, double> || std::is_same_v<T, dcomplex>) {
         if (counts_losses_) count_losses(from, tile.size(), file_.CellType, losses_);
         if (is_narrow(file_)) {
-            const auto samples = static_cast<std::size_t>(tile.samples);
-            narrow_.resize(samples * static_cast<std::size_t>(file_.element_sizeof()));
-            for (int line = 0; line < tile.lines; ++line) {
-                narrow(from + static_cast<std::size_t>(line) * samples, samples, narrow_.data());
-                write_bytes(sample_offset(file_, tile.first_line + line, tile.first_sample),
-                            reinterpret_cast<const char*>(narrow_.data()),
-                            static_cast<std::int64_t>(narrow_.size()));
-            }
+            narrow_.resize(stored_size(file_, tile));
+            narrow(from, narrow_);
+            write(tile, narrow_.data());
             return;
         }
     }

@@ -65,16 +65,18 @@ public:
      * imaginary part 0. Throws Failure, also for complex samples as real ones. */
     template <typename T>
     void read(const Tile& tile, T* to);
-    /** Reads `bytes` bytes from `offset` on. Throws Failure. */
-    void read_bytes(std::int64_t offset, char* to, std::int64_t bytes);
+    /** Reads a tile's samples as they stand in the file. Throws Failure. */
+    void read(const Tile& tile, char* to);
 
 private:
+    friend class NewRaster;
     [[noreturn]] void fail() const;
 
     std::string name_;
     BufferFile file_;
-    std::vector<double> real_;         // of a tile that is read as complex
-    std::vector<signed char> narrow_;  // a line of 8-bit parts
+    std::vector<double> real_;  // of a tile that is read as complex
+    std::vector<char> narrow_;  // the 8-bit parts of a tile
+    std::vector<char> lines_;   // of a tile, with what lies between
 };
 
 /** Whether integers of one raster's type fit another's, so that none can be clipped or lost. */
@@ -101,8 +103,10 @@ public:
      * disk does not take it. */
     template <typename T>
     void write(const Tile& tile, const T* from);
-    /** Writes bytes from `offset` on. Throws Failure. */
-    void write_bytes(std::int64_t offset, const char* from, std::int64_t bytes);
+    /** Writes a tile's samples as they are to stand in the file. Throws Failure. */
+    void write(const Tile& tile, const char* from);
+    /** Copies bytes of another raster to `offset` and on. Throws Failure. */
+    void copy_bytes(std::int64_t offset, RasterReader& from, std::int64_t from_offset, std::int64_t bytes);
     /** The raster is complete: it and its side file, in which other sections stay, take their names together. Says
      * on standard error how many of the samples written could not be kept, if any. Throws Failure, and
      * Interrupted. */
@@ -120,7 +124,7 @@ private:
     BufferFile file_;
     Losses losses_;
     bool counts_losses_ = true;
-    std::vector<signed char> narrow_;  // a line of 8-bit parts
+    std::vector<char> narrow_;  // the 8-bit parts of a tile
 };
 
 /** Where a sample stands in the file; the prefix of its line ends at sample 0. */

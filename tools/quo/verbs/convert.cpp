@@ -10,6 +10,7 @@
 #include "commands.h"
 #include "interrupt.h"
 #include "progress.h"
+#include "quo_base/gen_utils.h"
 #include "raster.h"
 
 namespace tool {
@@ -63,14 +64,19 @@ private:
     double scale_, offset_;
 };
 
-/** Samples of a tile in the type that they are written from. */
-using Samples =
-    std::variant<std::vector<float>, std::vector<double>, std::vector<fcomplex>, std::vector<dcomplex>>;
+/** Samples of a tile in the type that they are written from, or as they are to stand in the file. */
+using Samples = std::variant<std::vector<char>, std::vector<float>, std::vector<double>, std::vector<fcomplex>,
+                             std::vector<dcomplex>>;
 
 struct Converted {
     Tile tile;
     Samples samples;
 };
+
+/** Whether samples stay what they are, but for their byte order. */
+bool keeps_samples(const RasterDescription& wanted, const RasterDescription& in, const Scaling& scaling) {
+    return wanted.CellType == in.CellType && !scaling.changes();
+}
 
 /** What a thread needs to read tiles and bring their samples to what is written. */
 class TileReader {
@@ -80,6 +86,7 @@ public:
         : in_{name, in}, wanted_{wanted}, scaling_{scaling}, lines_{lines}, samples_{samples} {}
 
     Converted read(const Tile& tile) {
+        if (keeps_samples(wanted_, in_.description(), scaling_)) return {tile, stored(tile)};
         const bool complex = wanted_.is_complex() != 0;
         if (scaling_.changes()) {
             if (complex) return {tile, scaled<dcomplex>(tile)};
@@ -92,12 +99,24 @@ public:
     }
 
 private:
-    template <typename T>
-    std::vector<T> samples(Tile tile) {
-        std::vector<T> values(tile.size());
+    [[nodiscard]] Tile in_source(Tile tile) const {
         tile.first_line += lines_.first;
         tile.first_sample += samples_.first;
-        in_.read(tile, values.data());
+        return tile;
+    }
+    // Bytes of one type, in the byte order that is wanted.
+    std::vector<char> stored(const Tile& tile) {
+        const int bytes = wanted_.element_sizeof(), parts = 1 + wanted_.is_complex();
+        std::vector<char> values(tile.size() * static_cast<std::size_t>(bytes));
+        in_.read(in_source(tile), values.data());
+        get_endian(values.data(), static_cast<std::int64_t>(tile.size()) * parts, bytes / parts,
+                   wanted_.ByteOrder == in_.description().ByteOrder ? 0 : 1);
+        return values;
+    }
+    template <typename T>
+    std::vector<T> samples(const Tile& tile) {
+        std::vector<T> values(tile.size());
+        in_.read(in_source(tile), values.data());
         return values;
     }
     // In double precision, whatever the two types.
@@ -146,6 +165,19 @@ private:
         Progress progress{options_.waitbar ? "Converting" : nullptr};
         std::vector<Tile> tiles;
         for_each_tile(lines_.count(), samples_.count(), 1, [&](const Tile& tile) { tiles.push_back(tile); });
+        const auto tell = [&](const Tile& tile) {
+            progress.step(
+                sample_offset(wanted_, tile.first_line + tile.lines - 1, tile.first_sample + tile.samples),
+                wanted_.rasterSize());
+        };
+        if (keeps_bytes()) {
+            for (const Tile& tile : tiles) {
+                throw_if_interrupted();
+                copy(tile);
+                tell(tile);
+            }
+            return;
+        }
         auto tile = tiles.cbegin();
         const auto next = [&]() -> std::optional<Tile> {
             throw_if_interrupted();
@@ -159,9 +191,7 @@ private:
         };
         blocks::in_order(options_.threads, next, make_worker, [&](const Converted& part) {
             write(part);
-            progress.step(sample_offset(wanted_, part.tile.first_line + part.tile.lines - 1,
-                                        part.tile.first_sample + part.tile.samples),
-                          wanted_.rasterSize());
+            tell(part.tile);
         });
     }
 
@@ -174,25 +204,34 @@ private:
 
     void copy_prefix(int line) {
         const std::int64_t bytes = wanted_.RowPrefix;
-        const std::int64_t from = sample_offset(in_.description(), lines_.first + line, 0) - bytes;
-        const std::int64_t to = sample_offset(wanted_, line, 0) - bytes;
-        for (std::int64_t done = 0; done < bytes; done += kPiece) {
-            const std::int64_t piece = std::min(kPiece, bytes - done);
-            prefix_.resize(static_cast<std::size_t>(piece));
-            in_.read_bytes(from + done, prefix_.data(), piece);
-            out_.write_bytes(to + done, prefix_.data(), piece);
-        }
+        out_.copy_bytes(sample_offset(wanted_, line, 0) - bytes, in_,
+                        sample_offset(in_.description(), lines_.first + line, 0) - bytes, bytes);
     }
 
-    static constexpr std::int64_t kPiece = 1 << 20;
+    // Whether whole lines are copied as they stand.
+    [[nodiscard]] bool keeps_bytes() const {
+        const RasterDescription& in = in_.description();
+        const bool same_order = wanted_.ByteOrder == in.ByteOrder || wanted_.CellType >= INT8_COMPLEX;
+        return keeps_samples(wanted_, in, scaling_) && same_order && samples_.count() == in.NrOfPixelsPerLine &&
+               wanted_.RowPrefix == in.RowPrefix;
+    }
+    // From the first prefix to the last sample.
+    void copy(const Tile& tile) {
+        const std::int64_t prefix = tile.first_sample == 0 ? wanted_.RowPrefix : 0;
+        const std::int64_t to = sample_offset(wanted_, tile.first_line, tile.first_sample) - prefix;
+        const std::int64_t end =
+            sample_offset(wanted_, tile.first_line + tile.lines - 1, tile.first_sample + tile.samples);
+        const std::int64_t from =
+            sample_offset(in_.description(), lines_.first + tile.first_line, tile.first_sample) - prefix;
+        out_.copy_bytes(to, in_, from, end - to);
+    }
 
     const ConvertOptions& options_;
     Cut lines_, samples_;
     Wanted wanted_;
     Scaling scaling_;
-    RasterReader in_;  // for the lines' prefixes
+    RasterReader in_;  // for what is copied as it stands
     NewRaster out_;
-    std::vector<char> prefix_;
 };
 
 int convert(const ConvertOptions& options) {

@@ -2,8 +2,8 @@
 
 #include <algorithm>
 #include <cmath>
-#include <limits>
 #include <new>
+#include <span>
 #include <utility>
 
 #include "quo_base/interp_orb.h"
@@ -45,13 +45,15 @@ StraightFlight straight_flight(const double from[3], const double to[3], double 
 std::unique_ptr<OrbitModel> OrbitModel::create(std::int32_t vectors) noexcept {
     const std::int32_t count = vectors - kRunVectors + 1;
     std::unique_ptr<OrbitRun[]> runs{new (std::nothrow) OrbitRun[static_cast<std::size_t>(count)]};
-    if (!runs) return nullptr;
-    return std::unique_ptr<OrbitModel>{new (std::nothrow) OrbitModel{std::move(runs), count}};
+    std::unique_ptr<OrbitPlace[]> places{new (std::nothrow) OrbitPlace[static_cast<std::size_t>(count)]};
+    if (!runs || !places) return nullptr;
+    return std::unique_ptr<OrbitModel>{new (std::nothrow) OrbitModel{std::move(runs), std::move(places), count}};
 }
 
 void OrbitModel::copy(const OrbitModel& other) noexcept {
     static_cast<OrbitModelValues&>(*this) = static_cast<const OrbitModelValues&>(other);
     std::copy_n(other.runs_.get(), runs_count_, runs_.get());
+    std::copy_n(other.places_.get(), places_count_, places_.get());
 }
 
 int OrbitModel::build(const StateVectors& states, double t0) noexcept {
@@ -61,6 +63,7 @@ int OrbitModel::build(const StateVectors& states, double t0) noexcept {
     if (const int status = fit_runs(states)) return status;
     cursor_.in_use = use_run(times_, 0.0);
     if (const int status = fit_whole(states)) return status;
+    plant_places();
     fresh_ = cursor_.in_use;
     cursor_.switches = 0;
     ready_ = true;
@@ -92,6 +95,16 @@ int OrbitModel::fit_whole(const StateVectors& states) noexcept {
     return orb_interp(0.0, step, positions, velocities, kRunVectors, coarse_x_, coarse_y_, coarse_z_);
 }
 
+/** Takes a run's start every ten seconds or so of a low orbit, and a good number of them on a short arc. */
+void OrbitModel::plant_places() noexcept {
+    constexpr double kFewest = 64.0, kPerRad = 100.0;
+    const double most = std::min<double>(runs_count_, kFewest + kPerRad * arc_rad_);
+    const std::int32_t stride = runs_count_ / static_cast<std::int32_t>(most);
+    places_count_ = 0;
+    for (std::int32_t k = 0; k < runs_count_; k += stride) places_[places_count_++] = {run(k).start(), k};
+    plant_tree({places_.get(), static_cast<std::size_t>(places_count_)});
+}
+
 bool OrbitModel::linear_guess(const Vec3& point, double rate_m_s, double turn, PointTimes* guess) const noexcept {
     const double coarse = mean_.time_of(point - run(0).start(), rate_m_s, turn) / spacing();
     if (!std::isfinite(coarse)) return false;
@@ -113,55 +126,73 @@ double OrbitModel::coarse_guess(const Target& target) const noexcept {
     return seen.t_s;
 }
 
-int OrbitModel::solve_near(RunCursor& cursor, double guess_since_first_s, const Target& target, double* t,
+int OrbitModel::solve_near(RunCursor& cursor, double* guess_since_first_s, const Target& target, double* t,
                            double* range_s) const noexcept {
     const double length = times_.run_length();
-    double guess = first_time() + guess_since_first_s;
+    double guess = first_time() + *guess_since_first_s;
     for (double before = -1.0;; before = cursor.in_use.number) {
         const OrbitRun& here = select(cursor, guess);
         const RunInUse& in_use = cursor.in_use;
         if (in_use.number == before) return QUO_OK;
-        ImageTime seen{};
-        const int status = image_time(here.curve(), target.point, std::clamp(guess - in_use.start_s, 0.0, length),
-                                      {0.0, length}, target.lambda_m, target.fd_hz, &seen);
-        const bool solved = status == QUO_OK && seen.settled && seen.t_s >= 0.0 && seen.t_s <= length;
-        if (!solved) return before < 0.0 ? static_cast<int>(QUO_NOT_SEEN) : static_cast<int>(QUO_OK);
-        guess = *t = in_use.start_s + seen.t_s;
+        const ImageTime seen =
+            search_time(here.curve(), target.point, std::clamp(guess - in_use.start_s, 0.0, length), {0.0, length},
+                        target.range_rate_m_s());
+        const bool solved = seen.seen && seen.settled && seen.t_s >= 0.0 && seen.t_s <= length;
+        if (!solved && before >= 0.0) return QUO_OK;
+        guess = in_use.start_s + seen.t_s;
+        if (!solved) {
+            *guess_since_first_s = guess - first_time();
+            return QUO_NOT_SEEN;
+        }
+        *t = guess;
         *range_s = seen.tau_s;
         // A guess at the edge of a run's middle leads out of it, where another run serves: once more there.
         if (before >= 0.0 || (guess >= in_use.earliest_s && guess <= in_use.latest_s)) return QUO_OK;
     }
 }
 
+int OrbitModel::solve_from(RunCursor& cursor, double guess_since_first_s, double reach_s, const Target& target,
+                           double* t, double* range_s) const noexcept {
+    constexpr int kMostTurns = 6;
+    double guess = guess_since_first_s;
+    for (int turn = 0; turn < kMostTurns; ++turn) {
+        if (solve_near(cursor, &guess, target, t, range_s) == QUO_OK) return QUO_OK;
+        if (!(std::abs(guess - guess_since_first_s) <= reach_s)) break;
+        guess = std::clamp(guess, 0.0, length());
+    }
+    return QUO_NOT_SEEN;
+}
+
 void OrbitModel::settle(RunCursor& cursor, const PointTimes& found, const Target& target, double* t,
                         double* range_s) const noexcept {
-    if (solve_near(cursor, found.since_first_s, target, t, range_s) == QUO_OK) return;
+    if (solve_from(cursor, found.since_first_s, 0.0, target, t, range_s) == QUO_OK) return;
     *t = first_time() + found.since_first_s;
     *range_s = found.range_s;
 }
 
 int OrbitModel::solve_anywhere(double guess_since_first_s, const Target& target,
                                PointTimes* found) const noexcept {
+    // Further away there may be another pass of the point, or the far side of the Earth.
+    constexpr double kFurthest_rad = 0.1;
+    constexpr int kMostTurns = 20;
     const double dt = spacing(), length = times_.run_length();
     const std::int32_t last = runs_count_ - 1;
     double since_first = guess_since_first_s;
-    // Each turn moves on by up to a run's length: the turns suffice for any orbit and end any to and fro.
-    for (std::int32_t turn = 0; turn < runs_count_ + 2; ++turn) {
+    for (int turn = 0; turn < kMostTurns; ++turn) {
         const std::int32_t k = centred(since_first / dt);
-        ImageTime seen{};
-        if (image_time(run(k).curve(), target.point, std::clamp(since_first - k * dt, 0.0, length),
-                       {-length, 2.0 * length}, target.lambda_m, target.fd_hz, &seen) ||
-            !seen.settled)
-            return QUO_NOT_SEEN;
+        const ImageTime seen =
+            search_time(run(k).curve(), target.point, std::clamp(since_first - k * dt, 0.0, length),
+                        {-length, 2.0 * length}, target.range_rate_m_s());
         const double u = seen.t_s;
         const double early = k == 0 ? -kEndTolerance_s : 0.0;
         const double late = k == last ? length + kEndTolerance_s : length;
-        if (u >= early && u <= late) {
+        if (seen.seen && seen.settled && u >= early && u <= late) {
             *found = {k * dt + u, seen.tau_s};
             return QUO_OK;
         }
         if ((u < early && k == 0) || (u > late && k == last)) return QUO_NOT_SEEN;
         since_first = k * dt + u;
+        if (!(std::abs(since_first - guess_since_first_s) <= flight_s(kFurthest_rad))) return QUO_NOT_SEEN;
     }
     return QUO_NOT_SEEN;
 }
@@ -264,15 +295,8 @@ int OrbitModel::search_all(const Target& target, PointTimes* found) const noexce
 }
 
 double OrbitModel::nearest_start(const Vec3& point) const noexcept {
-    double nearest2 = std::numeric_limits<double>::infinity();
-    std::int32_t at = 0;
-    for (std::int32_t k = 0; k < runs_count_; ++k) {
-        const Vec3 d = point - run(k).start();
-        if (dot(d, d) >= nearest2) continue;
-        nearest2 = dot(d, d);
-        at = k;
-    }
-    return at * spacing();
+    const std::span<const OrbitPlace> tree{places_.get(), static_cast<std::size_t>(places_count_)};
+    return nearest_in_tree(tree, point) * spacing();
 }
 
 }  // namespace quo

@@ -6,6 +6,7 @@
 #include <memory>
 
 #include "generalSAR/orbit/orbit_interpolation.h"
+#include "generalSAR/orbit/place_tree.h"
 #include "generalSAR/orbit_arrays/array_kernels.h"
 #include "sarutillib/geometry/geometry_kernels.h"
 
@@ -38,6 +39,7 @@ struct OrbitModelValues {
     double coarse_x_[5]{}, coarse_y_[5]{}, coarse_z_[5]{};  // the whole orbit, in the time since the first vector
     double resampling_m_ = 0.0;  // what the interpolation that made the vectors may have left
     double arc_rad_ = 0.0;
+    std::int32_t places_count_ = 0;  // the first ones of places_, a tree of run starts
     bool ready_ = false;
 };
 
@@ -73,6 +75,7 @@ public:
     [[nodiscard]] double first_time() const noexcept { return times_.first_s; }
     [[nodiscard]] double spacing() const noexcept { return times_.spacing_s; }
     [[nodiscard]] double length() const noexcept { return (vectors() - 1) * spacing(); }
+    [[nodiscard]] double run_length() const noexcept { return times_.run_length(); }
     [[nodiscard]] std::int64_t switches() const noexcept { return cursor_.switches; }
 
     /** Makes the run in use suit time t, which is finite, and returns it. */
@@ -109,28 +112,36 @@ public:
     double coarse_guess(const Target& target) const noexcept;
     /** When the point is seen: Newton's method from a first guess, on the run in use made to suit it. `t` is on
      * the absolute scale. Where the solution leaves the middle of that run it is found again on the run that
-     * serves there. 0, or 12 when it lies outside the run or the steps ran out; nothing is then written. */
-    int solve_near(RunCursor& cursor, double guess_since_first_s, const Target& target, double* t,
+     * serves there. 0, or 12 when it lies outside the run or the steps ran out; `t` and `range_s` then stay, and
+     * the guess becomes the time that the last step led to. */
+    int solve_near(RunCursor& cursor, double* guess_since_first_s, const Target& target, double* t,
+                   double* range_s) const noexcept;
+    /** The same from run to run, few whatever the spacing, as long as a step leads no further than `reach_s` from
+     * the guess. */
+    int solve_from(RunCursor& cursor, double guess_since_first_s, double reach_s, const Target& target, double* t,
                    double* range_s) const noexcept;
     /** Ends a search that found the point's times on some run: solves again on the run that serves that time, so
      * that the way back to the ground starts from the same curve. Where that one has no solution, as beyond the
      * ends, the times stay those found. */
     void settle(RunCursor& cursor, const PointTimes& found, const Target& target, double* t,
                 double* range_s) const noexcept;
-    /** As solve_near() over the whole orbit, from run to run, until a run holds its own solution. A
-     * solution up to 1e-4 s beyond the first or the last vector counts as on the orbit. */
+    /** The times on the run with the nearest vector in its middle, going from run to run until one holds its own
+     * solution. A solution up to 1e-4 s beyond the first or the last vector counts as on the orbit. */
     int solve_anywhere(double guess_since_first_s, const Target& target, PointTimes* found) const noexcept;
     /** Of all times at which the point is seen the one from nearest by, found by the changes of sign that the
      * Doppler equation makes from vector to vector, also where there are two between two vectors. 0 or 12. */
     int search_all(const Target& target, PointTimes* found) const noexcept;
-    /** Time since the first vector of the run that starts nearest to the point. */
+    /** Time since the first vector of a run that starts as near to the point as any, but for some ten seconds of
+     * flight in low orbit. */
     double nearest_start(const Vec3& point) const noexcept;
     /** How far the platform flies round the Earth, about, as an angle. */
     [[nodiscard]] double arc_rad() const noexcept { return arc_rad_; }
+    /** In how long it flies about so much of the way round. */
+    [[nodiscard]] double flight_s(double angle_rad) const noexcept { return angle_rad / arc_rad_ * length(); }
 
 private:
-    OrbitModel(std::unique_ptr<OrbitRun[]> runs, std::int32_t count) noexcept
-        : runs_{std::move(runs)}, runs_count_{count} {}
+    OrbitModel(std::unique_ptr<OrbitRun[]> runs, std::unique_ptr<OrbitPlace[]> places, std::int32_t count) noexcept
+        : runs_{std::move(runs)}, places_{std::move(places)}, runs_count_{count} {}
     [[nodiscard]] const OrbitRun& run_of(const RunInUse& in_use) const noexcept {
         return run(static_cast<std::int32_t>(in_use.number));
     }
@@ -149,8 +160,10 @@ private:
                       Nearest& nearest) const noexcept;
     int fit_runs(const StateVectors& states) noexcept;
     int fit_whole(const StateVectors& states) noexcept;
+    void plant_places() noexcept;
 
     std::unique_ptr<OrbitRun[]> runs_;
+    std::unique_ptr<OrbitPlace[]> places_;  // room for one of each run
     std::int32_t runs_count_;
 };
 

@@ -1,10 +1,16 @@
 #include "generalSAR/orbit/orbit_points.h"
 
+#include <algorithm>
+
 namespace quo {
 namespace {
 
 // On arcs longer than kLongArc_rad straight flight is no guess, and already on these the coarse curve is none.
 constexpr double kLongCoarseArc_rad = 3.0;
+// On arcs longer than this a guess that did not lead to the point at once may lead to another pass of it.
+constexpr double kOnePassArc_rad = 1.2;
+// A guess is off by no more than that, or a run's length.
+constexpr double kReach_rad = 0.02;
 
 /** When the point is seen where the first guess does not lead there: from the other guess through the whole orbit,
  * from the nearest state vector, or wherever the Doppler equation changes sign. 0 or 12. */
@@ -18,20 +24,32 @@ int search_times(const OrbitModel& model, const Target& target, PointTimes* foun
     return model.search_all(target, found);
 }
 
+/** The first guess, as a time since the first vector: on the run in use, else through the whole orbit. False where
+ * the speed does not allow the Doppler, or where the arc is too long for a guess. */
+bool first_guess(const OrbitModel& model, const RunCursor& cursor, const Target& target, bool precise,
+                 double* since_first_s) noexcept {
+    if (model.arc_rad() > (precise ? kLongCoarseArc_rad : kLongArc_rad)) return false;
+    const double rate = target.range_rate_m_s();
+    if (!precise && model.guess_on(cursor.in_use, target.point, rate, kFirstRoot, since_first_s)) return true;
+    PointTimes guess{};
+    if (!model.linear_guess(target.point, rate, kFirstRoot, &guess)) return false;
+    *since_first_s = precise ? model.coarse_guess(target) : guess.since_first_s;
+    return true;
+}
+
 }  // namespace
 
 int find_times(const OrbitModel& model, RunCursor& cursor, const Target& target, bool precise, double* t,
                double* range_s) noexcept {
-    const double rate = target.range_rate_m_s();
-    PointTimes guess{};
-    if (model.arc_rad() <= (precise ? kLongCoarseArc_rad : kLongArc_rad)) {
-        const bool at_hand =
-            !precise && model.guess_on(cursor.in_use, target.point, rate, kFirstRoot, &guess.since_first_s);
-        if (at_hand || model.linear_guess(target.point, rate, kFirstRoot, &guess)) {
-            if (precise) guess.since_first_s = model.coarse_guess(target);
-            if (model.solve_near(cursor, guess.since_first_s, target, t, range_s) == QUO_OK) return QUO_OK;
-        }
-    }
+    const bool one_pass = model.arc_rad() <= kOnePassArc_rad;
+    const double reach_s = std::max(model.flight_s(kReach_rad), model.run_length());
+    double start_s = 0.0;
+    if (first_guess(model, cursor, target, precise, &start_s) &&
+        model.solve_from(cursor, start_s, one_pass ? reach_s : 0.0, target, t, range_s) == QUO_OK)
+        return QUO_OK;
+    if (!one_pass &&
+        model.solve_from(cursor, model.nearest_start(target.point), reach_s, target, t, range_s) == QUO_OK)
+        return QUO_OK;
     PointTimes found{};
     if (const int status = search_times(model, target, &found)) return status;
     model.settle(cursor, found, target, t, range_s);

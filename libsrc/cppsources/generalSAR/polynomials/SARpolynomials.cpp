@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <atomic>
 #include <charconv>
 #include <cstddef>
 #include <iterator>
@@ -25,12 +26,20 @@
 /** How long the lists of a set really are: a length is public and may have been raised. */
 struct quo::PolynomialLists {
     static void note(polySAR& set, std::size_t index, const void* list, std::int32_t length) {
-        set.made_[index] = {list, length};
+        polySAR::Made& made = set.made_[index];
+        made.list = list;
+        made.length = length;
+        made.ordered = 0;
     }
     static std::int32_t held(const polySAR& set, std::size_t index, const void* list, std::int32_t length) {
         const polySAR::Made& made = set.made_[index];
         if (!list) return 0;
         return list == made.list ? std::min(length, made.length) : length;
+    }
+    /** Where it is kept how many first ones of a list are in order; null for a list put in place by hand. */
+    static std::atomic<std::int32_t>* ordered(const polySAR& set, std::size_t index, const void* list) {
+        const polySAR::Made& made = set.made_[index];
+        return list == made.list ? &made.ordered : nullptr;
     }
 };
 
@@ -105,6 +114,7 @@ class List {
 public:
     List(const polySAR& set, std::size_t index, const std::unique_ptr<P[]>& list, std::int32_t count)
         : quantity_{kQuantities[index]},
+          ordered_{quo::PolynomialLists::ordered(set, index, list.get())},
           p_{list.get(),
              static_cast<std::size_t>(std::max(quo::PolynomialLists::held(set, index, list.get(), count), 0))} {}
 
@@ -130,22 +140,49 @@ public:
     void coefficients(double azimuth, double* c) const {
         if (p_.size() == 1) return copy(p_[0], c);
         if (azimuth < p_.front().taz0) {
-            return quantity_.extrapolates ? blend(0, weight(0, azimuth), c) : copy(p_.front(), c);
+            return quantity_.extrapolates ? blend(0, weight(0, 1, azimuth), c) : copy(p_.front(), c);
         }
         if (azimuth > p_.back().taz0) return beyond(azimuth, c);
         const std::size_t k = std::min(earlier(azimuth), p_.size() - 2);
-        blend(k, weight(k, azimuth), c);
+        blend(k, weight(k, k + 1, azimuth), c);
     }
 
 private:
     // A time that compares with nothing is after everything.
     [[nodiscard]] std::size_t first_at_or_after(double azimuth) const {
-        std::size_t i = 0;
+        constexpr std::size_t kLong = 32;
+        std::size_t i = p_.size() < kLong ? 0 : ordered();
+        if (i > 0 && azimuth <= p_[i - 1].taz0) return first_in_order(azimuth, i - 1);
         while (i < p_.size() && !(azimuth <= p_[i].taz0)) ++i;
         return i;
     }
-    [[nodiscard]] double weight(std::size_t k, double azimuth) const {
-        return (azimuth - p_[k].taz0) / (p_[k + 1].taz0 - p_[k].taz0);
+    /** How many first ones do not decrease in time, where that can be kept. */
+    [[nodiscard]] std::size_t ordered() const {
+        if (!ordered_) return 0;
+        auto known = static_cast<std::size_t>(ordered_->load(std::memory_order_relaxed));
+        if (known == 0) {
+            for (known = 1; known < p_.size() && p_[known - 1].taz0 <= p_[known].taz0;) ++known;
+            ordered_->store(static_cast<std::int32_t>(known), std::memory_order_relaxed);
+        }
+        return std::min(known, p_.size());
+    }
+    /** The same among those in order, `after` being one at or after the time. Times are mostly evenly spaced. */
+    [[nodiscard]] std::size_t first_in_order(double azimuth, std::size_t after) const {
+        constexpr int kGuesses = 4;
+        if (azimuth <= p_[0].taz0) return 0;
+        std::size_t before = 0;
+        for (int probe = 0; after - before > 1; ++probe) {
+            const double width = static_cast<double>(after - before);
+            const double part = weight(before, after, azimuth);
+            const double place = probe < kGuesses && part >= 0.0 && part <= 1.0 ? part * width : 0.5 * width;
+            const std::size_t i = before + static_cast<std::size_t>(std::clamp(place, 1.0, width - 1.0));
+            (azimuth <= p_[i].taz0 ? after : before) = i;
+        }
+        return after;
+    }
+    /** What part of the time from one to another has gone by. */
+    [[nodiscard]] double weight(std::size_t from, std::size_t to, double azimuth) const {
+        return (azimuth - p_[from].taz0) / (p_[to].taz0 - p_[from].taz0);
     }
     static void copy(const P& from, double* c) { std::ranges::copy(from.pol, c); }
     void blend(std::size_t k, double w, double* c) const {
@@ -159,6 +196,7 @@ private:
     }
 
     const Quantity& quantity_;
+    std::atomic<std::int32_t>* ordered_;
     std::span<const P> p_;
 };
 

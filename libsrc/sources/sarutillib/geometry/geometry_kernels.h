@@ -80,17 +80,22 @@ using DopplerResidual = DopplerResidualOf<double>;
 using ImageTime = ImageTimeOf<double>;
 
 /** Time at which P is seen with a Doppler, by Newton's method from `start_s`, and the range time before the last
- * step. 12 where an iterate but the last leaves the span or anything is not a number. Running out of steps is told
- * in the result alone.
+ * step. Not seen, and then the last iterate, where one but the last leaves the span or anything is not a number.
+ * Running out of steps is told by what is not settled alone.
  *
  * Targets seen close to either end need room beyond it: from the middle of a segment of 10 s spacing the first
  * iterate lands up to 0.1 s beside a solution at the end, at 60 s spacing up to 3 s. */
+inline ImageTime search_time(const OrbitSegment& orbit, const Vec3& P, double start_s, const TimeSpan& span,
+                             double range_rate_m_s) noexcept {
+    auto search = TimeSearchOf<double>::begin(start_s, true);
+    for (int step = 0; step < kInverseSteps && search.open; ++step) search.step(orbit, P, span, range_rate_m_s);
+    return search.end();
+}
+
+/** The same with a Doppler in Hz; 12 and nothing written where P is not seen. */
 inline int image_time(const OrbitSegment& orbit, const Vec3& P, double start_s, const TimeSpan& span,
                       double lambda_m, double fd_hz, ImageTime* seen) noexcept {
-    auto search = TimeSearchOf<double>::begin(start_s, true);
-    for (int step = 0; step < kInverseSteps && search.open; ++step)
-        search.step(orbit, P, span, 0.5 * lambda_m * fd_hz);
-    const ImageTime found = search.end();
+    const ImageTime found = search_time(orbit, P, start_s, span, 0.5 * lambda_m * fd_hz);
     if (!found.seen) return QUO_NOT_SEEN;
     *seen = found;
     return QUO_OK;

@@ -1,0 +1,1 @@
+quo_bench(growth SOURCES growth_bench.cpp COMPONENTS container)

@@ -1,0 +1,9 @@
+// Compiled with AVX-512 switched on.
+#include <cstdint>
+#include <type_traits>
+
+#include "datafilelib/kernel_table.h"
+
+namespace quo::kernels_avx512 {
+#include "datafilelib/sample_kernels.inc"
+}  // namespace quo::kernels_avx512

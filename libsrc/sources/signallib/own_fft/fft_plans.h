@@ -1,0 +1,67 @@
+#ifndef QUO_FFT_PLANS_H
+#define QUO_FFT_PLANS_H
+
+#include <cstddef>
+#include <cstdint>
+#include <tuple>
+#include <vector>
+
+#include "signallib/fft_engine.h"
+#include "signallib/own_fft/fft_kernels.h"
+
+namespace quo {
+
+enum class FftWay : std::uint8_t { Columns, Rows, ShortRows };
+
+/** What tables are made for. */
+struct FftKind {
+    FftWay way = FftWay::Columns;
+    int length = 2;
+    bool forward = true;
+    int lanes = 4;
+
+    friend bool operator<(const FftKind& a, const FftKind& b) {
+        return std::tie(a.way, a.length, a.forward, a.lanes) < std::tie(b.way, b.length, b.forward, b.lanes);
+    }
+};
+
+/** Whether a length has no prime factor above 7. */
+[[nodiscard]] bool is_own_fft_length(int length) noexcept;
+
+/** The way and the lanes that take the fewest operations; no more lanes than `widest`. Throws std::bad_alloc. */
+[[nodiscard]] FftKind choose_fft(const FftGeometry& geometry, int widest = 16);
+
+/** How a transform is taken apart, and the roots that it takes. They are computed in double precision and never
+ * change, so that any number of plans and threads share them. */
+class FftTables {
+public:
+    explicit FftTables(const FftKind& kind);
+    FftTables(const FftTables&) = delete;
+    FftTables& operator=(const FftTables&) = delete;
+
+    /** Floats that a run works in. */
+    [[nodiscard]] std::size_t room() const noexcept;
+    /** Transforms `count` rows or columns; `pitch` floats lie between rows of the image. */
+    void run(const float* in, float* out, std::ptrdiff_t pitch, int count, float* room) const noexcept;
+
+private:
+    [[nodiscard]] const FftRoot* keep(std::vector<FftRoot> roots);
+    [[nodiscard]] ShortFft take_apart(int length, int together);
+    [[nodiscard]] LaneFft down_lanes(int length, int packs);
+    [[nodiscard]] RowFft along_row();
+    void turn_lanes(RowFft& row);
+
+    FftKind kind_;
+    const FftKernels* kernels_;
+    std::vector<std::vector<FftRoot>> roots_;
+    std::vector<float> turns_;
+    LaneFft lanes_;
+    RowFft row_;
+};
+
+/** Bytes that the tables and the room of one run take. */
+[[nodiscard]] std::size_t fft_bytes(const FftKind& kind) noexcept;
+
+}  // namespace quo
+
+#endif

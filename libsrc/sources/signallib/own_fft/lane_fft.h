@@ -1,0 +1,511 @@
+#ifndef QUO_LANE_FFT_H
+#define QUO_LANE_FFT_H
+
+#include <cstddef>
+#include <cstring>
+#include <utility>
+
+#include "signallib/own_fft/fft_kernels.h"
+
+/* The kernels of fft_kernels.h for W lanes. Included once for every width, by a source with flags of its own;
+ * whatever is not inlined carries the width in its name, so that no other source can take it for its own. */
+
+namespace quo {
+
+/** cos(2 pi k / n) and -sin(2 pi k / n), by their series about 0. */
+struct ExactRoot {
+    double re = 0.0, im = 0.0;
+
+    constexpr ExactRoot(int k, int n) {
+        const double x = -2.0 * 3.14159265358979323846 * (2 * k > n ? k - n : k) / n;
+        double term = 1.0;
+        for (int i = 0; i < 40; ++i, term *= x / i) (i % 2 == 0 ? re : im) += i % 4 < 2 ? term : -term;
+    }
+};
+
+template <int W>
+struct LaneFfts {
+    typedef float V __attribute__((vector_size(4 * W)));
+    typedef float Loose __attribute__((vector_size(4 * W), aligned(4), may_alias));
+    static constexpr std::ptrdiff_t kSlot = 2 * W;
+
+#define QUO_FFT_HERE __attribute__((always_inline))
+#define QUO_FFT_INLINE QUO_FFT_HERE static inline
+
+    // --- Complex values, one a lane
+    // ------------------------------------------------------------------------------
+
+    struct C {
+        V re, im;
+    };
+    QUO_FFT_INLINE C add(C a, C b) { return {a.re + b.re, a.im + b.im}; }
+    QUO_FFT_INLINE C subtract(C a, C b) { return {a.re - b.re, a.im - b.im}; }
+    template <class Root>
+    QUO_FFT_INLINE C turn(C a, const Root& by) {
+        return {a.re * by.re - a.im * by.im, a.re * by.im + a.im * by.re};
+    }
+    /** Turned by exp(-2 pi i K / N). */
+    template <int K, int N>
+    QUO_FFT_INLINE C turn(C a) {
+        constexpr int kEighths = 8 * K % N == 0 ? 8 * K / N % 8 : -1;
+        constexpr ExactRoot kRoot{K % N, N};
+        constexpr float kRe = static_cast<float>(kRoot.re), kIm = static_cast<float>(kRoot.im);
+        if constexpr (kEighths == 0) return a;
+        if constexpr (kEighths == 2) return {a.im, -a.re};
+        if constexpr (kEighths == 4) return {-a.re, -a.im};
+        if constexpr (kEighths == 6) return {-a.im, a.re};
+        if constexpr (kEighths == 1 || kEighths == 5) return {(a.re + a.im) * kRe, (a.im - a.re) * kRe};
+        if constexpr (kEighths == 3 || kEighths == 7) return {(a.re - a.im) * kRe, (a.re + a.im) * kRe};
+        return {a.re * kRe - a.im * kIm, a.re * kIm + a.im * kRe};
+    }
+
+    // --- Slots
+    // ---------------------------------------------------------------------------------------------------
+
+    template <std::size_t... I>
+    QUO_FFT_INLINE C part(V a, V b, std::index_sequence<I...> /*lanes*/) {
+        return {__builtin_shufflevector(a, b, (2 * I)...), __builtin_shufflevector(a, b, (2 * I + 1)...)};
+    }
+    template <std::size_t... I>
+    QUO_FFT_INLINE void join(C c, float* to, std::index_sequence<I...> /*lanes*/) {
+        *reinterpret_cast<Loose*>(to) = __builtin_shufflevector(c.re, c.im, (I / 2 + I % 2 * W)...);
+        *reinterpret_cast<Loose*>(to + W) = __builtin_shufflevector(c.re, c.im, (W / 2 + I / 2 + I % 2 * W)...);
+    }
+    template <bool Interleaved>
+    QUO_FFT_INLINE C load(const float* from) {
+        const V a = *reinterpret_cast<const Loose*>(from), b = *reinterpret_cast<const Loose*>(from + W);
+        if constexpr (Interleaved) return part(a, b, std::make_index_sequence<W>{});
+        return {a, b};
+    }
+    template <bool Interleaved>
+    QUO_FFT_INLINE void save(C c, float* to) {
+        if constexpr (Interleaved) return join(c, to, std::make_index_sequence<W>{});
+        *reinterpret_cast<Loose*>(to) = c.re;
+        *reinterpret_cast<Loose*>(to + W) = c.im;
+    }
+
+    // --- Butterflies
+    // ---------------------------------------------------------------------------------------------
+
+    template <std::size_t... I, class Body>
+    QUO_FFT_INLINE void each_of(std::index_sequence<I...> /*numbers*/, const Body& body) {
+        (body(std::integral_constant<int, static_cast<int>(I)>{}), ...);
+    }
+    /** `body` with 0, 1, ..., N - 1 as constants. */
+    template <int N, class Body>
+    QUO_FFT_INLINE void each(const Body& body) {
+        each_of(std::make_index_sequence<N>{}, body);
+    }
+    static constexpr int inner_radix(int radix) {
+        return radix % 4 == 0 && radix > 4 ? 4 : radix % 2 == 0 ? radix / 2 : radix == 9 ? 3 : radix;
+    }
+
+    /** The transform of R values, in natural order. */
+    template <int R>
+    QUO_FFT_INLINE void butterfly(C (&x)[R]) {
+        if constexpr (R == 2) {
+            const C difference = subtract(x[0], x[1]);
+            x[0] = add(x[0], x[1]);
+            x[1] = difference;
+        } else if constexpr (inner_radix(R) != R) {
+            composite<inner_radix(R), R / inner_radix(R)>(x);
+        } else if constexpr (R > 2) {
+            prime(x);
+        }
+    }
+    /** A transforms of length B apart and B of length A; coprime ones, which are numbered by their remainders,
+     * need no turns between them. */
+    template <int A, int B>
+    QUO_FFT_INLINE void composite(C (&x)[A * B]) {
+        constexpr int R = A * B;
+        constexpr bool kCoprime = A % 2 != B % 2 && A % B != 0 && B % A != 0;
+        C y[A][B];
+        each<B>([&](auto b) QUO_FFT_HERE {
+            C t[A];
+            each<A>([&](auto a) QUO_FFT_HERE { t[a] = x[kCoprime ? (B * a + A * b) % R : B * a + b]; });
+            butterfly<A>(t);
+            each<A>([&](auto k) QUO_FFT_HERE { y[k][b] = turn < kCoprime ? 0 : b * k, R > (t[k]); });
+        });
+        each<A>([&](auto k) QUO_FFT_HERE { butterfly<B>(y[k]); });
+        each<R>([&](auto k) QUO_FFT_HERE { x[k] = y[k % A][kCoprime ? k % B : k / A]; });
+    }
+    /** Sums and differences of the values that lie opposite need half the products. */
+    template <int R>
+    QUO_FFT_INLINE void prime(C (&x)[R]) {
+        constexpr int kHalf = R / 2;
+        C sum[kHalf], difference[kHalf], all = x[0], out[R];
+        each<kHalf>([&](auto j) QUO_FFT_HERE {
+            sum[j] = add(x[j + 1], x[R - 1 - j]);
+            difference[j] = subtract(x[j + 1], x[R - 1 - j]);
+            all = add(all, sum[j]);
+        });
+        each<kHalf>([&](auto k) QUO_FFT_HERE {
+            C even = x[0], odd{};
+            each<kHalf>([&](auto j) QUO_FFT_HERE {
+                constexpr ExactRoot kRoot{(j + 1) * (k + 1) % R, R};
+                constexpr float kCosine = static_cast<float>(kRoot.re), kSine = static_cast<float>(-kRoot.im);
+                even = add(even, {sum[j].re * kCosine, sum[j].im * kCosine});
+                const C part{difference[j].im * kSine, difference[j].re * kSine};
+                odd = j == 0 ? part : add(odd, part);
+            });
+            out[k + 1] = {even.re + odd.re, even.im - odd.im};
+            out[R - 1 - k] = {even.re - odd.re, even.im + odd.im};
+        });
+        each<kHalf>([&](auto k) QUO_FFT_HERE {
+            x[k + 1] = out[k + 1];
+            x[R - 1 - k] = out[R - 1 - k];
+        });
+        x[0] = all;
+    }
+
+    // --- Passes
+    // --------------------------------------------------------------------------------------------------
+
+    /** A pass from slots `in_step` apart to slots `out_step` apart. `zero` holds sample 0. */
+    struct Route {
+        const float *zero, *in;
+        float* out;
+        std::ptrdiff_t in_step, out_step;
+        const FftRoot* outer;
+        const float* lanes;  ///< slots that stand as those of `out` do
+    };
+    enum Turns { kNone, kInner, kOuter, kLanes };
+
+    template <int R, bool InInterleaved, bool OutInterleaved, Turns T>
+    static void pass(const FftPass& pass, const Route& route) {
+        const std::ptrdiff_t in_hop = pass.count * pass.stride * route.in_step;
+        const std::ptrdiff_t out_hop = pass.stride * route.out_step;
+        const FftRoot* roots = T == kOuter ? route.outer : pass.roots;
+        for (int p = 0; p < pass.count; ++p) {
+            const float* from = route.in + std::ptrdiff_t{p} * pass.stride * route.in_step;
+            float* to = route.out + std::ptrdiff_t{p} * R * out_hop;
+            for (int q = 0; q < pass.stride; ++q, from += route.in_step, to += route.out_step) {
+                C x[R];
+                x[0] = load<InInterleaved>(p + q == 0 ? route.zero : from);
+                each<R - 1>([&](auto j) QUO_FFT_HERE { x[j + 1] = load<InInterleaved>(from + (j + 1) * in_hop); });
+                butterfly<R>(x);
+                if constexpr (T == kInner)
+                    each<R - 1>([&](auto k) QUO_FFT_HERE { x[k + 1] = turn(x[k + 1], roots[k]); });
+                if constexpr (T == kOuter)
+                    each<R>([&](auto k) QUO_FFT_HERE { x[k] = turn(x[k], roots[q + k * pass.stride]); });
+                if constexpr (T == kLanes)
+                    each<R>([&](auto k) QUO_FFT_HERE {
+                        x[k] = turn(x[k], load<false>(route.lanes + (to - route.out) + k * out_hop));
+                    });
+                each<R>([&](auto k) QUO_FFT_HERE { save<OutInterleaved>(x[k], to + k * out_hop); });
+            }
+            if constexpr (T == kInner) roots += R - 1;
+        }
+    }
+
+    using PassKernel = void (*)(const FftPass&, const Route&);
+    static constexpr int kRadices = 17;
+    struct PassTable {
+        PassKernel of[kRadices];
+    };
+    template <bool InInterleaved, bool OutInterleaved, Turns T, int... R>
+    static constexpr PassTable passes_of(std::integer_sequence<int, R...> /*radices*/) {
+        PassTable table{};
+        ((table.of[R] = pass<R, InInterleaved, OutInterleaved, T>), ...);
+        return table;
+    }
+    template <bool InInterleaved, bool OutInterleaved, Turns T>
+    static PassKernel find(int radix) {
+        static constexpr PassTable kTable = passes_of<InInterleaved, OutInterleaved, T>(
+            std::integer_sequence<int, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 16>{});
+        return kTable.of[radix];
+    }
+
+    /** Where the slots of a transform stand. */
+    template <class Float>
+    struct Slots {
+        Float* at;
+        std::ptrdiff_t step;
+        bool interleaved;
+    };
+    /** What the results are turned by, if anything: all lanes by one root, or each by its own, from slots that
+     * stand as those of the results do. */
+    struct Outer {
+        const FftRoot* roots = nullptr;
+        const float* lanes = nullptr;
+    };
+    using From = Slots<const float>;
+    using To = Slots<float>;
+
+    static PassKernel last_pass(int radix, bool in, bool out, const Outer& outer) {
+        if (outer.lanes) return in ? find<true, false, kLanes>(radix) : find<false, false, kLanes>(radix);
+        if (outer.roots) return in ? find<true, false, kOuter>(radix) : find<false, false, kOuter>(radix);
+        if (in) return out ? find<true, true, kNone>(radix) : find<true, false, kNone>(radix);
+        return out ? find<false, true, kNone>(radix) : find<false, false, kNone>(radix);
+    }
+    /** `work` holds the transform twice. */
+    static void run(const ShortFft& fft, From in, To out, Outer outer, float* work) {
+        Route route{in.at, in.at, work, in.step, kSlot, outer.roots, outer.lanes};
+        if (fft.reverse) {
+            route.in += fft.length * in.step;
+            route.in_step = -in.step;
+        }
+        bool interleaved = in.interleaved;
+        const int last = fft.passes - 1;
+        for (int k = 0; k < last; ++k) {
+            const FftPass& pass = fft.pass[k];
+            (interleaved ? find<true, false, kInner>(pass.radix) : find<false, false, kInner>(pass.radix))(pass,
+                                                                                                           route);
+            interleaved = false;
+            float* const next = route.out == work ? work + fft.length * fft.together * kSlot : work;
+            route = {route.out, route.out, next, kSlot, kSlot, outer.roots, outer.lanes};
+        }
+        route.out = out.at;
+        route.out_step = out.step;
+        last_pass(fft.pass[last].radix, interleaved, out.interleaved, outer)(fft.pass[last], route);
+    }
+
+    // --- Transforms down the lanes
+    // -------------------------------------------------------------------------------
+
+    /** Copies rows, and asks early for those that are too far apart for the processor to see them coming. */
+    static void move(const float* from, std::ptrdiff_t from_step, float* to, std::ptrdiff_t to_step, int rows,
+                     std::ptrdiff_t floats) {
+        constexpr std::ptrdiff_t kAhead = 12, kLine = 16;
+        constexpr std::ptrdiff_t kWhole = kStripPacks * kSlot;
+        for (int row = 0; row < rows; ++row, from += from_step, to += to_step) {
+            const float* const next = from + kAhead * from_step;
+            if (row + kAhead < rows)
+                for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(next + k);
+            if (floats == kWhole)
+                std::memcpy(to, from, sizeof(float) * kWhole);
+            else
+                std::memcpy(to, from, sizeof(float) * static_cast<std::size_t>(floats));
+        }
+    }
+
+    /** `packs` packs of columns in two steps. Interleaved slots pass through a stage of `floats` floats a row,
+     * split ones stand `pack_step` apart. */
+    static void two_steps(const LaneFft& fft, From in, To out, int packs, std::ptrdiff_t floats,
+                          const float* turns, float* room) {
+        const int n1 = fft.second.length, n2 = fft.first.length;
+        float *const work = room, *const stage = work + fft.work, *const tile = stage + fft.stage;
+        const std::ptrdiff_t stage_step = packs * kSlot, tile_row = packs * fft.pitch * kSlot;
+        for (int i = 0; i < n1; ++i) {
+            if (in.interleaved) move(in.at + i * in.step, n1 * in.step, stage, stage_step, n2, floats);
+            for (int b = 0; b < packs; ++b) {
+                const From from = in.interleaved ? From{stage + b * kSlot, stage_step, true}
+                                                 : From{in.at + i * in.step, n1 * in.step, false};
+                run(fft.first, from, {tile + (b * fft.pitch + i) * kSlot, tile_row, false},
+                    {fft.outer + std::ptrdiff_t{i} * n2}, work);
+            }
+        }
+        for (int k = 0; k < n2; ++k) {
+            for (int b = 0; b < packs; ++b) {
+                const To to = out.interleaved ? To{stage + b * kSlot, stage_step, true}
+                                              : To{out.at + k * out.step, n2 * out.step, false};
+                run(fft.second, {tile + (k * packs + b) * fft.pitch * kSlot, kSlot, false}, to,
+                    {nullptr, turns ? turns + k * out.step : nullptr}, work);
+            }
+            if (out.interleaved) move(stage, stage_step, out.at + k * out.step, n2 * out.step, n1, floats);
+        }
+    }
+    /** One whole pack. */
+    static void one_pack(const LaneFft& fft, From in, To out, const float* turns, float* room) {
+        if (fft.two_steps()) return two_steps(fft, in, out, 1, kSlot, turns, room);
+        run(fft.first, in, out, {nullptr, turns}, room);
+    }
+    /** Columns that fill no pack. */
+    static void part_pack(const LaneFft& fft, From in, To out, std::ptrdiff_t floats, float* room) {
+        float* const stage = room + fft.work;
+        move(in.at, in.step, stage, kSlot, fft.first.length, floats);
+        run(fft.first, {stage, kSlot, true}, {stage, kSlot, true}, {}, room);
+        move(stage, kSlot, out.at, out.step, fft.first.length, floats);
+    }
+
+    static void columns(const LaneFft& fft, const FftColumns& columns, float* room) noexcept {
+        const int width = fft.two_steps() ? kStripPacks * W : W;
+        for (int c = 0; c < columns.count; c += width) {
+            const int some = columns.count - c < width ? columns.count - c : width;
+            const From in{columns.in + 2 * std::ptrdiff_t{c}, columns.step, true};
+            const To out{columns.out + 2 * std::ptrdiff_t{c}, columns.step, true};
+            const std::ptrdiff_t floats = 2 * std::ptrdiff_t{some};
+            if (fft.two_steps())
+                two_steps(fft, in, out, (some + W - 1) / W, floats, nullptr, room);
+            else if (some == W)
+                one_pack(fft, in, out, nullptr, room);
+            else
+                part_pack(fft, in, out, floats, room);
+        }
+    }
+
+    // --- Rows
+    // ----------------------------------------------------------------------------------------------------
+
+    /** Within each quarter of four lanes: `Run` of the first vector and `Run` of the second by turns, from the
+     * lower halves or the upper ones. */
+    template <int Run, bool Upper, std::size_t... I>
+    QUO_FFT_INLINE V weave(V a, V b, std::index_sequence<I...> /*lanes*/) {
+        return __builtin_shufflevector(
+            a, b, (I / 4 * 4 + I % 4 / (2 * Run) + I % Run + (Upper ? 2 : 0) + I / Run % 2 * W)...);
+    }
+    /** Of each `2 * H` lanes, the first vector's upper half changes places with the second's lower one. */
+    template <int H, bool Upper, std::size_t... I>
+    QUO_FFT_INLINE V exchange(V a, V b, std::index_sequence<I...> /*lanes*/) {
+        return __builtin_shufflevector(a, b, ((I & H) == 0 ? I + (Upper ? H : 0) : I - (Upper ? 0 : H) + W)...);
+    }
+    /** Vectors `H` apart meet. */
+    template <int H>
+    QUO_FFT_INLINE void meet(V (&v)[W]) {
+        constexpr std::make_index_sequence<W> kLanes;
+        each<W>([&](auto i) QUO_FFT_HERE {
+            if constexpr ((i & H) == 0) {
+                const V a = v[i], b = v[i + H];
+                if constexpr (H < 4) {
+                    v[i] = weave<H, false>(a, b, kLanes);
+                    v[i + H] = weave<H, true>(a, b, kLanes);
+                } else {
+                    v[i] = exchange<H, false>(a, b, kLanes);
+                    v[i + H] = exchange<H, true>(a, b, kLanes);
+                }
+            }
+        });
+    }
+    /** Lanes become vectors and vectors lanes: squares of four by four first, for which there are fast
+     * instructions. */
+    QUO_FFT_INLINE void transpose(V (&v)[W]) {
+        meet<1>(v);
+        meet<2>(v);
+        each<W / 4>([&](auto i) QUO_FFT_HERE {
+            const V second = v[4 * i + 1];
+            v[4 * i + 1] = v[4 * i + 2];
+            v[4 * i + 2] = second;
+        });
+        if constexpr (W >= 8) meet<4>(v);
+        if constexpr (W >= 16) meet<8>(v);
+    }
+    /** W slots become W others, each by a function of its own: one part after the other. */
+    template <class Load, class Save>
+    QUO_FFT_INLINE void transpose_slots(const Load& load_one, const Save& save_one) {
+        C slots[W];
+        V part[W];
+        each<W>([&](auto i) QUO_FFT_HERE { slots[i] = load_one(i); });
+        each<W>([&](auto i) QUO_FFT_HERE { part[i] = slots[i].re; });
+        transpose(part);
+        each<W>([&](auto i) QUO_FFT_HERE { slots[i].re = part[i]; });
+        each<W>([&](auto i) QUO_FFT_HERE { part[i] = slots[i].im; });
+        transpose(part);
+        each<W>([&](auto i) QUO_FFT_HERE { save_one(i, C{slots[i].re, part[i]}); });
+    }
+
+    /** First of a pack's lanes: the last pack overlaps the one before it. */
+    QUO_FFT_INLINE int lane_of(int pack, int count) { return (pack + 1) * W <= count ? pack * W : count - W; }
+
+    /** W results of each transform of step 1 become the lanes of step 2. */
+    template <bool ByPack>
+    static void turn_pack(const RowFft& fft, const float* tile, int result, float* lanes) {
+        const int n1 = fft.second.length(), n2 = fft.first.length();
+        for (int b = 0; b * W < n1; ++b) {
+            const float* const slots = tile + (b * fft.pitch + result) * kSlot;
+            const FftRoot* const turns = fft.packs + std::ptrdiff_t{b} * n2 + result;
+            float* const to = lanes + lane_of(b, n1) * kSlot;
+            transpose_slots(
+                [&](auto i) QUO_FFT_HERE {
+                    const C c = load<false>(slots + i * kSlot);
+                    if constexpr (ByPack) return turn(c, turns[i]);
+                    return c;
+                },
+                [&](auto i, C c) QUO_FFT_HERE { save<false>(c, to + i * kSlot); });
+        }
+    }
+
+    /** Asks for samples of the next row while this one is at work. */
+    QUO_FFT_INLINE void fetch(const float* from, std::ptrdiff_t floats) {
+        constexpr std::ptrdiff_t kLine = 16;
+        for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(from + k);
+    }
+    static void rows(const RowFft& fft, const FftRows& rows, float* room) noexcept {
+        const int n1 = fft.second.length(), n2 = fft.first.length();
+        float *const tile = room, *const lanes = tile + fft.tile, *const rest = lanes + fft.lanes;
+        for (std::ptrdiff_t row = 0; row < rows.count; ++row) {
+            const float* const in = rows.in + row * rows.distance;
+            float* const out = rows.out + row * rows.distance;
+            for (int b = 0; b * W < n1; ++b)
+                one_pack(fft.first, {in + 2 * lane_of(b, n1), 2 * std::ptrdiff_t{n1}, true},
+                         {tile + b * fft.pitch * kSlot, kSlot, false},
+                         fft.turns + (fft.packs ? 0 : std::ptrdiff_t{b} * n2 * kSlot), rest);
+            for (int c = 0; c * W < n2; ++c) {
+                const int result = lane_of(c, n2);
+                (fft.packs ? turn_pack<true> : turn_pack<false>)(fft, tile, result, lanes);
+                one_pack(fft.second, {lanes, kSlot, false}, {out + 2 * result, 2 * std::ptrdiff_t{n2}, true},
+                         nullptr, rest);
+                if (row + 1 < rows.count) fetch(in + rows.distance + c * kSlot * n1, kSlot * n1);
+            }
+        }
+    }
+
+    // --- Short rows, one a lane
+    // ----------------------------------------------------------------------------------
+
+    /** Where sample `i` of a pack stands. */
+    QUO_FFT_INLINE std::ptrdiff_t slot_of(const LaneFft& fft, int pack, int i, bool mirror) {
+        return (std::ptrdiff_t{mirror && i > 0 ? fft.first.length - i : i} * fft.packs + pack) * kSlot;
+    }
+    /** Row by row, for those that are shorter than a vector. */
+    template <class Move>
+    QUO_FFT_INLINE void each_sample(const LaneFft& fft, int pack, bool mirror, const FftRows& rows,
+                                    const Move& move_one) {
+        for (int i = 0; i < fft.first.length; ++i)
+            for (int r = 0; r < rows.count; ++r)
+                move_one(slot_of(fft, pack, i, mirror) + r, r * rows.distance + 2 * i);
+    }
+    static void into_lanes(const LaneFft& fft, int pack, const FftRows& rows, float* lanes) {
+        if (fft.first.length < W)
+            return each_sample(fft, pack, fft.mirror, rows, [&](auto lane, auto sample) QUO_FFT_HERE {
+                lanes[lane] = rows.in[sample];
+                lanes[lane + W] = rows.in[sample + 1];
+            });
+        for (int b = 0; b * W < fft.first.length; ++b) {
+            const int first = lane_of(b, fft.first.length);
+            transpose_slots(
+                [&](auto r) QUO_FFT_HERE {
+                    return load<true>(rows.in + (r < rows.count ? r : 0) * rows.distance + 2 * first);
+                },
+                [&](auto i, C c)
+                    QUO_FFT_HERE { save<false>(c, lanes + slot_of(fft, pack, first + i, fft.mirror)); });
+        }
+    }
+    static void out_of_lanes(const LaneFft& fft, int pack, const float* lanes, const FftRows& rows) {
+        if (fft.first.length < W)
+            return each_sample(fft, pack, false, rows, [&](auto lane, auto sample) QUO_FFT_HERE {
+                rows.out[sample] = lanes[lane];
+                rows.out[sample + 1] = lanes[lane + W];
+            });
+        for (int b = 0; b * W < fft.first.length; ++b) {
+            const int first = lane_of(b, fft.first.length);
+            transpose_slots([&](auto i)
+                                QUO_FFT_HERE { return load<false>(lanes + slot_of(fft, pack, first + i, false)); },
+                            [&](auto r, C c) QUO_FFT_HERE {
+                                if (r < rows.count) save<true>(c, rows.out + r * rows.distance + 2 * first);
+                            });
+        }
+    }
+    static void short_rows(const LaneFft& fft, const FftRows& rows, float* room) noexcept {
+        float* const lanes = room + fft.work;
+        for (int row = 0; row < rows.count;) {
+            FftRows pack[kMostShortPacks];
+            int packs = 0;
+            for (; packs < fft.packs && row < rows.count; ++packs, row += W) {
+                const std::ptrdiff_t offset = row * rows.distance;
+                pack[packs] = {rows.in + offset, rows.out + offset, rows.distance,
+                               rows.count - row < W ? rows.count - row : W};
+                into_lanes(fft, packs, pack[packs], lanes);
+            }
+            run(fft.first, {lanes, kSlot, false}, {lanes, kSlot, false}, {}, room);
+            for (int b = 0; b < packs; ++b) out_of_lanes(fft, b, lanes, pack[b]);
+        }
+    }
+
+    static constexpr FftKernels kTable{W, columns, rows, short_rows};
+#undef QUO_FFT_HERE
+#undef QUO_FFT_INLINE
+};
+
+}  // namespace quo
+
+#endif

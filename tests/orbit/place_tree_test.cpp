@@ -1,0 +1,38 @@
+#include "generalSAR/orbit/place_tree.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cmath>
+#include <random>
+#include <vector>
+
+namespace {
+
+using quo::OrbitPlace;
+using quo::Vec3;
+
+// Judged by a look at every place: on lines, in planes, with places that coincide, from within and from far off.
+TEST(PlaceTree, FindsTheNearestOfAll) {
+    std::mt19937 random{7};
+    const auto number = [&](double size) { return size * (static_cast<double>(random()) / 2147483648.0 - 1.0); };
+    EXPECT_EQ(quo::nearest_in_tree({}, {}), 0);
+    for (std::int32_t count = 1; count < 400; count = count * 3 / 2 + 1)
+        for (const Vec3 size : {Vec3{7e6, 7e6, 7e6}, {7e6, 0.0, 7e6}, {0.0, 0.0, 7e6}, {2.0, 2.0, 2.0}}) {
+            std::vector<OrbitPlace> places;
+            for (std::int32_t run = 0; run < count; ++run)
+                places.push_back({{number(size.x), number(size.y), number(size.z)}, run});
+            if (size.x == 2.0)
+                for (auto& [at, run] : places) at = {std::round(at.x), std::round(at.y), std::round(at.z)};
+            const std::vector<OrbitPlace> in_order = places;
+            quo::plant_tree(places);
+            for (int i = 0; i < 100; ++i) {
+                const Vec3 point{number(2e7), number(9e6), number(9e6)};
+                const auto distance = [&](const OrbitPlace& place) { return norm(point - place.at); };
+                const auto found = static_cast<std::size_t>(quo::nearest_in_tree(places, point));
+                ASSERT_EQ(distance(in_order[found]), distance(std::ranges::min(in_order, {}, distance)));
+            }
+        }
+}
+
+}  // namespace
