@@ -22,9 +22,9 @@ QUO_BASE_C_BEGIN
  * them. Engines run on the caller's thread alone.
  *
  * Making a plan takes microseconds to a few milliseconds and measures nothing, so that every run on one machine
- * gives the same bits. The tables of a plan are kept for the process (the 32 geometries used last), so that the same
- * plan made again takes well under 2 microseconds. Planning never touches the caller's buffers. FFTW measures, which
- * takes up to seconds, where QUO_FFT_PLANNING is "measure".
+ * gives the same bits. The tables of a plan are kept for the process (the 32 geometries used last), so that the
+ * same plan made again takes well under 2 microseconds. Planning never touches the caller's buffers. FFTW
+ * measures, which takes up to seconds, where QUO_FFT_PLANNING is "measure".
  *
  * Threads: all functions may be called by any number of threads at a time. Plans of FFTW are made one after the
  * other; transforms run side by side, by one plan too, on buffers that do not overlap. A plan is released when no
@@ -55,9 +55,9 @@ typedef struct FftPlan {
  * "mkl", or "none" where the one that QUO_FFT_ENGINE names cannot be loaded. */
 QUO_BASE_API const char* fft_engine_name(void) QUO_NOEXCEPT;
 
-/** Why the engine failed on this thread: none can be loaded that takes the length, memory is too short, or what the engine's
- * library answered. Statuses 4, 5 and 7 of the functions below leave it, but for a chirp-z transform that finds no
- * memory of its own (7); making the next plan empties it. Nothing of the kind goes into the report.
+/** Why the engine failed on this thread: none can be loaded that takes the length, memory is too short, or what
+ * the engine's library answered. Statuses 4, 5 and 7 of the functions below leave it, but for a chirp-z transform
+ * that finds no memory of its own (7); making the next plan empties it. Nothing of the kind goes into the report.
  * @return the text, empty where there is none; never null, and valid until this thread's next call of this header
  */
 QUO_BASE_API const char* fft_engine_error(void) QUO_NOEXCEPT;
@@ -75,9 +75,9 @@ QUO_BASE_API const char* fft_engine_error(void) QUO_NOEXCEPT;
  * @return 0; 1 for a null plan, n < 1, m < 1 or an image that no address space holds; 2 for nfft outside 1..n; 3
  * for mfft outside 1..m; 4 when the row transforms cannot be had (unknown direction, no memory, no engine); 5 when
  * the column transforms cannot be had, in which case nothing is left of the rows'. fft_engine_error() tells the
- * cause where it lies with the engine. Memory that the engine may take is looked for before it starts: twice a row of
- * more than 65536 samples with "quo", four times a shorter one and up to 65 columns; with the others some five times
- * the transform, ten times with prime factors above 13, and up to 100 MiB more. */
+ * cause where it lies with the engine. Memory that the engine may take is looked for before it starts: twice a row
+ * of more than 65536 samples with "quo", four times a shorter one and up to 65 columns; with the others some five
+ * times the transform, ten times with prime factors above 13, and up to 100 MiB more. */
 QUO_BASE_API int fft_makep_c(FftPlan* plan, int n, int nfft, int m, int mfft, int dir_rows, int dir_cols,
                              int in_place) QUO_NOEXCEPT;
 

@@ -140,8 +140,8 @@ enum { ISO_TEXT_LENGTH = 26 };
  * @return 0; 1 for a null pointer or another time */
 QUO_BASE_API int sec852iso(double t, char* text_out) QUO_NOEXCEPT;
 
-/** ISO 8601 text to sec85: date and time of day to any number of decimals, with or without "UTC=" before it and "Z"
- * behind it. Of a time in this century the double keeps quarters of a microsecond.
+/** ISO 8601 text to sec85: date and time of day to any number of decimals, with or without "UTC=" before it and
+ * "Z" behind it. Of a time in this century the double keeps quarters of a microsecond.
  *
  * @param[in]  text   the text
  * @param[out] t_out  sec85, negative before 1985; unchanged unless 0 is returned

@@ -18,7 +18,7 @@ namespace {
 /** A text that belongs to libxml2. */
 std::string taken(xmlChar* text) {
     if (!text) return {};
-    const std::string copy{trimmed(reinterpret_cast<const char*>(text))};
+    std::string copy{trimmed(reinterpret_cast<const char*>(text))};
     xmlFree(text);
     return copy;
 }

@@ -304,9 +304,8 @@ void set_ground_polynomials(const Annotation& a, const ImageGrid_Obj& grid, poly
         for (int i = 0; i <= kNodes; ++i) {
             ground_m.push_back(grid.GroundStep_m * (a.samples - 1) * i / kNodes);
             double slant_m = 0.0;
-            for (int term = ImageGrid_Obj::kTerms; term-- > 0;)
-                slant_m = slant_m * ground_m.back() +
-                          grid.GroundToSlant[static_cast<std::size_t>(k * ImageGrid_Obj::kTerms + term)];
+            const auto first = grid.GroundToSlant.begin() + std::ptrdiff_t{k} * ImageGrid_Obj::kTerms;
+            for (int term = ImageGrid_Obj::kTerms; term-- > 0;) slant_m = slant_m * ground_m.back() + first[term];
             range_s.push_back(2.0 * slant_m / kLightSpeed);
             delay_s.push_back(range_s.back() - range_s.front());
         }

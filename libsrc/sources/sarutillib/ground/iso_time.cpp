@@ -2,6 +2,7 @@
 
 #include <charconv>
 #include <chrono>
+#include <cmath>
 #include <cstdio>
 #include <cstring>
 
@@ -64,7 +65,7 @@ int sec852iso(double t, char* text_out) noexcept {
     if (!text_out || !(t >= 0.0 && t < kYear10000 - 1.0)) return QUO_REFUSED;
     namespace chrono = std::chrono;
     const auto whole = static_cast<std::int64_t>(t);
-    auto micro = static_cast<std::int64_t>((t - static_cast<double>(whole)) / kMicrosecond + 0.5);
+    std::int64_t micro = std::llround((t - static_cast<double>(whole)) / kMicrosecond);
     const chrono::sys_seconds second =
         chrono::sys_days{chrono::year{1985} / 1 / 1} + chrono::seconds{whole + micro / 1000000};
     micro %= 1000000;
