@@ -12,12 +12,13 @@ target_compile_definitions(quo_flags INTERFACE _FILE_OFFSET_BITS=64)
 # Optimising the tests themselves takes longer than running them as they are.
 set(quo_test_level -O1)
 if(QUO_SANITIZE)
-    # Nor do the tests themselves need every pointer checked: what they call has it checked.
-    set(quo_test_level -O0 -fno-sanitize=null,alignment,vptr)
+    # Nor do the tests themselves need every operation checked: what they call has it checked.
+    set(quo_test_level -O0 -fno-sanitize=undefined)
     # Frame pointers and line tables are enough for readable findings and keep the build small.
     set(quo_sanitize -fsanitize=$<IF:$<STREQUAL:${QUO_SANITIZE},thread>,thread,address$<COMMA>undefined>)
     list(APPEND quo_sanitize -fno-sanitize-recover=all -fno-omit-frame-pointer)
-    target_compile_options(quo_flags INTERFACE ${quo_sanitize} -O1 -g1)
+    # What a target says of itself would stand before these options, and lose.
+    target_compile_options(quo_flags INTERFACE ${quo_sanitize} -O1 -g1 $<TARGET_PROPERTY:QUO_LAST_OPTIONS>)
     target_link_options(quo_flags INTERFACE ${quo_sanitize})
 endif()
 if(QUO_BUILD_FUZZ)
@@ -92,6 +93,7 @@ function(quo_test_headers)
         file(CONFIGURE OUTPUT "${PROJECT_BINARY_DIR}/no_test.cpp" CONTENT "int main() {}\n")
         add_executable(quo_test_headers "${PROJECT_BINARY_DIR}/no_test.cpp")
         target_compile_options(quo_test_headers PRIVATE ${quo_test_level} -Wno-array-bounds -Wno-stringop-overflow)
+        set_target_properties(quo_test_headers PROPERTIES QUO_LAST_OPTIONS "${quo_test_level}")
         target_link_libraries(quo_test_headers PRIVATE quo_flags GTest::gmock)
         target_precompile_headers(quo_test_headers PRIVATE "${PROJECT_SOURCE_DIR}/tests/support/prelude.h")
     endif()
@@ -105,6 +107,7 @@ function(quo_test name)
     add_executable(${target} ${arg_SOURCES})
     # The compiler forgets of precompiled headers that they are the system's, and warns of what it finds in them.
     target_compile_options(${target} PRIVATE ${quo_test_level} -Wno-array-bounds -Wno-stringop-overflow)
+    set_target_properties(${target} PROPERTIES QUO_LAST_OPTIONS "${quo_test_level}")
     quo_test_headers()
     target_precompile_headers(${target} REUSE_FROM quo_test_headers)
     target_include_directories(${target} PRIVATE "${PROJECT_SOURCE_DIR}/tests")

@@ -18,18 +18,29 @@ struct RasterDerivation {
     double sample_step = 1.0;   ///< its samples from sample to sample
 };
 
+class GeneralSAR;
+class ImageGrid_Obj;
+
+/** The pixel grid of a product: the header's section "ImageGrid", else that of its region, where that has the size
+ * of the raster or none is described.
+ * @param header   the file that the product was read from
+ * @param product  what was read of it
+ * @param grid     changed in any case
+ * @return 0; 1 where there is neither; 4 for a section that makes no grid, which no region may stand for; 7 */
+QUO_BASE_API int read_image_grid(const char* header, const GeneralSAR& product, ImageGrid_Obj& grid) noexcept;
+
 /** Completes a raster that BufferFile::create() started, as BufferFile::commit() does, with the whole header of
  * the raster that it came of.
  *
  * All sections of that header are taken over, and those that place the raster are made to fit: "ImageGrid" (made
- * of the region where the other header has none, so that every pixel keeps its times), "ROI" where it had the
- * other raster's size, sampling rates that are the image's own, and corner points that the orbit gives. A header
+ * of the region where the other header has none, so that every pixel keeps its times), "ROI", sampling rates that
+ * are the image's own, and corner points that the orbit gives. A header
  * that stood at the raster's place is replaced.
  * @param raster  its description is the new raster's
  * @param header  header of the other raster; it may be the new one's own place
  * @param how     where its pixels come from
  * @return as BufferFile::commit(); 1 also for steps that are not above 0, for lines of bursts at another sampling,
- * and for a header that is there but cannot be read. The unfinished raster goes then. */
+ * and for a header that cannot be read; 4 for a grid that makes no image. The unfinished raster goes then. */
 QUO_BASE_API int commit_derived(BufferFile& raster, const char* header, const RasterDerivation& how);
 
 #endif

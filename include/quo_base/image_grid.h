@@ -72,7 +72,8 @@ public:
 
     ImageGrid_Obj();
 
-    /** Reads the section. 0; 1 where it is missing or makes no grid, 7. */
+    /** Reads the section. 0; 1 where it is missing; 4 where it makes no grid, is not complete or the file cannot
+     * be read; 7. */
     int readhdr(const char* file) override;
     using GeneralSAR_Base::writehdr;
     int writehdr(const char* file) override;  ///< writes the section; 0 or a failing status

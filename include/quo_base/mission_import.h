@@ -56,7 +56,8 @@ typedef struct quo_import_result {
  * @param[out] result   filled in any case
  * @return 0; 1 for a null, a product that is none of the mission's or lacks something, an orbit file that does not
  *         fit, or samples that cannot be linked; 4 for a measurement that is cut short; 5, 7, 9. The reason is in
- *         the report too. */
+ *         the report too. The antenna pattern follows when raster and header are in place: where it alone
+ *         cannot be written, the call says so, and they stay. */
 QUO_BASE_API int quo_import_sentinel1(const quo_import_request* request, quo_import_result* result) QUO_NOEXCEPT;
 
 QUO_BASE_C_END

@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "missions/mission_xml.h"
+#include "quo_base/derived_raster.h"
 #include "quo_base/generalSAR.h"
 #include "quo_base/image_grid.h"
 #include "quo_base/mission_import.h"
@@ -333,6 +334,102 @@ INSTANTIATE_TEST_SUITE_P(
                     Layout{"DetectedTiles", 16, SAMPLEFORMAT_UINT, COMPRESSION_LZW, true, true, 0}),
     [](const auto& test) { return std::string{test.param.name}; });
 
+// --- Cuts and other samplings -----------------------------------------------------------------------------------
+
+struct Cut {
+    const char *name, *safe;
+    int lines, samples;  // of the whole
+    RasterDerivation how;
+    int cut_lines, cut_samples;
+};
+class Cuts : public testing::TestWithParam<Cut> {};
+
+TEST_P(Cuts, KeepTheTimesOfTheirPixels) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    const Cut cut = GetParam();
+    const bool grd = cut.safe == kGrd;
+    Safe safe{folder, cut.safe};
+    safe.change(grd ? "<numberOfLines>16705<" : "<numberOfLines>4503<",
+                "<numberOfLines>" + std::to_string(cut.lines) + "<");
+    if (!grd) {
+        safe.change("<numberOfSamples>22694<", "<numberOfSamples>" + std::to_string(cut.samples) + "<");
+        safe.change("<linesPerBurst>1501<", "<linesPerBurst>4<");  // bursts of four lines, seconds apart
+    }
+    Layout layout = kPlain;
+    if (grd) layout = {"", 16, SAMPLEFORMAT_UINT, COMPRESSION_NONE, false, false, 1};
+    write_tiff(safe.measurement(), layout, static_cast<std::uint32_t>(cut.lines),
+               static_cast<std::uint32_t>(cut.samples), true);
+    quo_import_result result{};
+    const std::string whole = folder.file("whole.hdr"), part = folder.file("part");
+    ASSERT_EQ(import_safe(safe.path(), folder.file("whole"), result), 0) << result.message;
+    BufferFile raster{part.c_str()};
+    raster.setLines(cut.cut_lines);
+    raster.setSamples(cut.cut_samples);
+    raster.setType(INT16);
+    ASSERT_EQ(raster.create(), 0);
+    const std::vector<short> zeros(static_cast<std::size_t>(cut.cut_lines * cut.cut_samples));
+    raster.writebuffer(zeros.data(), 0, cut.cut_lines, 0, 0);
+    ASSERT_EQ(commit_derived(raster, whole.c_str(), cut.how), 0);
+
+    GeneralSAR product;
+    ImageGrid_Obj of_whole, of_part;
+    ASSERT_EQ(of_whole.readhdr(whole.c_str()), 0);
+    ASSERT_EQ(of_part.readhdr((part + ".hdr").c_str()), 0);
+    ASSERT_EQ(product.GSread((part + ".hdr").c_str()), 0);
+    EXPECT_STREQ(product.dataSetInfo.SceneID, safe.annotation().stem().c_str());
+    const ROI_Obj& region = product.roi.Roi;
+    for (const double line : {0.0, cut.cut_lines - 1.0})
+        for (const double sample : {0.0, cut.cut_samples - 1.0}) {
+            const double there_line = cut.how.first_line + line * cut.how.line_step,
+                         there_sample = cut.how.first_sample + sample * cut.how.sample_step;
+            double here[2], there[2];
+            ASSERT_EQ(of_part.pixelTimes({1, &line, &sample}, {&here[0], &here[1]}), 0);
+            ASSERT_EQ(of_whole.pixelTimes({1, &there_line, &there_sample}, {&there[0], &there[1]}), 0);
+            EXPECT_NEAR(here[0], there[0], 1e-9);
+            EXPECT_NEAR(here[1], there[1], 1e-15);
+            EXPECT_NEAR(region.FastStartTime + sample * region.FastTimeDelta, here[1], 1e-9);
+            const double delay = of_part.DelayShare * (here[1] - of_part.DelayReference_s);
+            if (line == 0.0)
+                EXPECT_NEAR(region.SlowStartTime, here[0] - delay, 3e-7);
+            else
+                EXPECT_NEAR(region.SlowStartTime + (region.Lines - 1) * region.SlowTimeDelta, here[0] - delay,
+                            2e-3);
+        }
+}
+INSTANTIATE_TEST_SUITE_P(Sentinel1, Cuts,
+                         testing::Values(Cut{"Bursts", kSlc, 12, 300, {5.0, 100.0, 1.0, 1.0}, 6, 150},
+                                         Cut{"WithinABurst", kSlc, 12, 300, {5.0, 0.0, 1.0, 1.0}, 2, 300},
+                                         Cut{"FinerSamples", kSlc, 12, 300, {0.0, 0.0, 1.0, 0.5}, 12, 600},
+                                         Cut{"GroundRange", kGrd, 4, 26102, {1.0, 13000.0, 1.0, 1.0}, 2, 1000},
+                                         Cut{"CoarserGround", kGrd, 4, 26102, {0.0, 6000.0, 2.0, 4.0}, 2, 5000}),
+                         [](const auto& test) { return std::string{test.param.name}; });
+
+TEST(CommitDerived, RefusesAndLeavesNothing) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    Safe safe{folder, kSlc};
+    safe.change("<numberOfLines>4503<", "<numberOfLines>12<");
+    safe.change("<numberOfSamples>22694<", "<numberOfSamples>30<");
+    safe.change("<linesPerBurst>1501<", "<linesPerBurst>4<");
+    write_tiff(safe.measurement(), kPlain, 12, 30, true);
+    quo_import_result result{};
+    ASSERT_EQ(import_safe(safe.path(), folder.file("whole"), result), 0) << result.message;
+    for (const RasterDerivation& how :
+         {RasterDerivation{0.0, 0.0, 2.0, 1.0}, RasterDerivation{0.0, 0.0, 1.0, 0.0}}) {
+        BufferFile raster{folder.file("part").c_str()};
+        raster.setLines(1);
+        raster.setSamples(1);
+        raster.setType(INT16);
+        ASSERT_EQ(raster.create(), 0);
+        const short zero = 0;
+        raster.writebuffer(&zero, 0, 1, 0, 0);
+        EXPECT_EQ(commit_derived(raster, folder.file("whole.hdr").c_str(), how), 1);
+        EXPECT_FALSE(fs::exists(folder.file("part")));
+        EXPECT_FALSE(fs::exists(folder.file("part.hdr")));
+    }
+}
+
 // --- What is refused --------------------------------------------------------------------------------------------
 
 TEST(Sentinel1, RefusesWhatDoesNotFitAndLeavesNothing) {
@@ -369,6 +466,26 @@ TEST(Sentinel1, RefusesWhatDoesNotFitAndLeavesNothing) {
         EXPECT_EQ(std::string{result.message}.find('\n'), std::string::npos);
         EXPECT_EQ(std::distance(fs::directory_iterator{folder.path()}, {}), 1) << from;
     }
+}
+
+TEST(Sentinel1, NeverReplacesTheProductsOwnFiles) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    Safe safe{folder, kSlc};
+    safe.shrink(false);
+    write_tiff(safe.measurement(), kPlain, 40, 30, true);
+    const std::string before = test::read_text(safe.measurement()), raster = folder.file("scene");
+    quo_import_result result{};
+    ASSERT_EQ(import_safe(safe.path(), raster, result, nullptr, true), 0) << result.message;
+    EXPECT_EQ(import_safe(safe.path(), raster, result), 1);  // through the link that the first one left
+    EXPECT_EQ(import_safe(safe.path(), safe.measurement(), result, nullptr, true), 1);
+    EXPECT_EQ(import_safe(safe.path(), safe.measurement(), result), 1);
+    EXPECT_EQ(import_safe(safe.path(), raster, result, nullptr, true), 0) << result.message;  // a link for a link
+    EXPECT_EQ(test::read_text(safe.measurement()), before);
+    EXPECT_EQ(import_safe(folder.file("scene.hdr"), raster, result), 1);  // no product
+    fs::resize_file(safe.measurement(), before.size() - 700);
+    EXPECT_NE(import_safe(safe.path(), folder.file("other"), result, nullptr, true), 0);
+    EXPECT_FALSE(fs::exists(folder.file("other.hdr")));
 }
 
 TEST(Sentinel1, TakesAnOrbitFileThatFits) {

@@ -1,14 +1,17 @@
 #include "quo_base/mission_import.h"
 
 #include <dlfcn.h>
+#include <fcntl.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <array>
 #include <bit>
 #include <cerrno>
+#include <cstdio>
 #include <cstdlib>
 #include <filesystem>
+#include <functional>
 #include <limits>
 #include <memory>
 #include <new>
@@ -21,11 +24,13 @@
 #include "missions/sentinel1.h"
 #include "quorelxmllib/header_session.h"
 #include "sarutillib/ground/bounded_text.h"
+#include "sarutillib/ground/file_io.h"
 
 namespace quo {
 namespace {
 
 constexpr const char* kSource = "mission_import";
+namespace fs = std::filesystem;
 
 [[noreturn]] void refuse(int status, const std::string& line) { throw MissionRefusal{status, line}; }
 
@@ -46,8 +51,9 @@ MeasurementEntry measurement_entry() {
     if (dladdr(reinterpret_cast<const void*>(&quo_import_sentinel1), &info) && info.dli_fname)
         folder = info.dli_fname;
     folder.erase(folder.rfind('/') + 1);
+    // Without a folder the name would be looked for where the process happens to work.
     for (const char* const place : {"quo_base/libquo_base_tiff.so", "libquo_base_tiff.so"})
-        if (const MeasurementEntry entry = entry_of(folder + place)) return entry;
+        if (const MeasurementEntry entry = folder.empty() ? nullptr : entry_of(folder + place)) return entry;
     refuse(QUO_REFUSED,
            "libquo_base_tiff.so, which reads measurements, is neither beside the library in quo_base/ nor named "
            "in QUO_TIFF_MODULE");
@@ -76,7 +82,7 @@ public:
     BlockWriter(Measurement& measurement, BufferFile& raster) : measurement_{measurement}, raster_{raster} {
         const std::size_t samples =
             static_cast<std::size_t>(measurement.block_lines) * static_cast<std::size_t>(measurement.samples);
-        constexpr std::size_t kMost = std::size_t{1} << 30;
+        constexpr std::size_t kMost = std::size_t{1} << 26;
         if (samples > kMost) refuse(QUO_REFUSED, "the measurement's blocks are longer than is believed");
         block_.resize(samples * bytes_of(measurement.type));
         if (widens()) wide_.resize(samples);
@@ -144,101 +150,149 @@ void copy_samples(const quo_import_request& request, Measurement& measurement, B
         if (const int status = raster.status())
             refuse(status, std::string{request.raster} + ": cannot be written");
     }
-    if (request.progress) (void)request.progress(request.context, measurement.lines, measurement.lines);
+    if (request.progress && request.progress(request.context, measurement.lines, measurement.lines) != 0)
+        refuse(QUO_REFUSED, std::string{request.raster} + ": the import was ended");
 }
 
-/** A link takes the raster's name in one step. */
-void link_samples(const std::string& measurement, const std::string& raster) {
-    namespace fs = std::filesystem;
-    std::error_code error;
-    const fs::path target = fs::absolute(measurement, error);
-    const std::string beside = raster + ".link." + std::to_string(getpid());
-    fs::create_symlink(target, beside, error);
-    if (!error) fs::rename(beside, raster, error);
-    errno = 0;
-    if (!error) return;
-    std::error_code ignored;
-    fs::remove(beside, ignored);
-    refuse(QUO_WRITE_FAILED, raster + ": cannot be made a link: " + error.message());
-}
+/** A link in the place of the raster, whose old file stays beside it until the link is kept. */
+class LinkedRaster {
+public:
+    LinkedRaster(const std::string& measurement, const std::string& raster)
+        : raster_{raster}, beside_{raster + ".link." + std::to_string(getpid())} {
+        std::error_code error;
+        const fs::path target = fs::absolute(measurement, error);
+        if (!error) fs::create_symlink(target, beside_, error);
+        if (!error) put_in_place(error);
+        errno = 0;
+        if (!error) return;
+        remove(beside_);
+        refuse(QUO_WRITE_FAILED, raster + ": cannot be made a link: " + error.message());
+    }
+    /** Unless it is kept, the raster is again what it was. */
+    ~LinkedRaster() {
+        if (!kept_ && exchanged_) (void)exchange();
+        remove(kept_ || exchanged_ ? beside_ : raster_);
+        errno = 0;
+    }
+    LinkedRaster(LinkedRaster&&) = delete;
+    void keep() { kept_ = true; }
+
+private:
+    [[nodiscard]] bool exchange() const {
+        return renameat2(AT_FDCWD, beside_.c_str(), AT_FDCWD, raster_.c_str(), RENAME_EXCHANGE) == 0;
+    }
+    void put_in_place(std::error_code& error) {
+        std::error_code unknown;
+        if (fs::symlink_status(raster_, unknown).type() == fs::file_type::not_found)
+            return fs::rename(beside_, raster_, error);
+        exchanged_ = exchange();
+        if (!exchanged_) error.assign(errno, std::generic_category());
+    }
+    static void remove(const std::string& file) {
+        std::error_code ignored;
+        fs::remove(file, ignored);
+    }
+
+    std::string raster_, beside_;
+    bool exchanged_ = false, kept_ = false;
+};
 
 // --- The header -------------------------------------------------------------------------------------------------
 
 /** The antenna pattern is a raster of its own, beside the product's: its header object takes the raster of its
- * header for the pattern. Taken away again where what comes after it fails. */
-class PatternFiles {
+ * header for the pattern. It takes its place after the product, so that an older one stays as long as that does.
+ */
+class PatternRaster {
 public:
-    explicit PatternFiles(std::string raster) : raster_{std::move(raster)} {}
-    ~PatternFiles() {
-        std::error_code ignored;
-        if (written_ && !kept_)
-            for (const char* const ending : {"", ".hdr"}) std::filesystem::remove(raster_ + ending, ignored);
-    }
-    PatternFiles(PatternFiles&&) = delete;
-
-    void write(AntennaPattern_Obj& pattern) {
+    PatternRaster(const std::string& name, AntennaPattern_Obj& pattern)
+        : name_{name}, header_{name + ".hdr"}, pattern_{pattern}, raster_{name.c_str()} {
         if (pattern.PatternSamples == 0) return;
-        const std::string header = raster_ + ".hdr";
-        HeaderSession session{header.c_str()};
-        BufferFile raster{raster_.c_str()};
-        raster.setLines(1);
-        raster.setSamples(pattern.PatternSamples);
-        raster.setType(FLOAT32);
-        int status = raster.create();
-        if (status == QUO_OK) {
-            raster.writebuffer(pattern.Pattern.data(), 0, 1, 0, 0);
-            status = pattern.writehdr(header.c_str());
-            if (const int committed = raster.commit(); status == QUO_OK) status = committed;
-        }
-        if (status != QUO_OK) refuse(status, raster_ + ": cannot be written");
-        written_ = true;
+        raster_.setLines(1);
+        raster_.setSamples(pattern.PatternSamples);
+        raster_.setType(FLOAT32);
+        require(raster_.create());
+        raster_.writebuffer(pattern.Pattern.data(), 0, 1, 0, 0);
+        require(raster_.status());
     }
-    void keep() { kept_ = true; }
+    void commit() {
+        if (pattern_.PatternSamples == 0) return;
+        const HeaderSession session{header_.c_str()};
+        require(pattern_.writehdr(header_.c_str()));
+        require(raster_.commit());
+    }
 
 private:
-    std::string raster_;
-    bool written_ = false, kept_ = false;
+    void require(int status) const {
+        if (status != QUO_OK) refuse(status, name_ + ": cannot be written");
+    }
+
+    std::string name_, header_;
+    AntennaPattern_Obj& pattern_;
+    BufferFile raster_;
 };
+
+/** Refuses to replace a file of the product itself: an older import may have left a link to it. Only a link takes
+ * the place of a link. */
+void require_apart(const quo_import_request& request, const Sentinel1Files& files) {
+    const std::string raster = request.raster, orbit{text_or_empty(request.orbit_file)};
+    for (const std::string& out : {raster, raster + ".hdr", raster + ".antenna", raster + ".antenna.hdr"})
+        for (const std::string& in : {files.measurement, files.annotation, files.manifest, orbit}) {
+            std::error_code error;
+            const bool renewed = request.link != 0 && out == raster && fs::is_symlink(out, error);
+            if (!in.empty() && !renewed && fs::equivalent(in, out, error) && !error)
+                refuse(QUO_REFUSED, out + ": is, or is a link to, " + in + ", which is read");
+        }
+    errno = 0;
+}
+
+void link_product(const Sentinel1Files& files, const Measurement& measurement, const std::string& raster_name,
+                  BufferFile& raster, const std::function<void()>& describe) {
+    if (measurement.plain_from < 0 || measurement.plain_from > std::numeric_limits<std::int32_t>::max() ||
+        measurement.type == MeasuredType::kUnsignedShort)
+        refuse(QUO_REFUSED,
+               files.measurement + ": its samples cannot be used where they are; import without a link");
+    raster.HeaderOffset = measurement.plain_from;
+    raster.ByteOrder = measurement.big_endian ? 1 : 0;
+    if (file_length(files.measurement.c_str()).value_or(0) < raster.rasterSize())
+        refuse(QUO_READ_FAILED, files.measurement + ": is cut short");
+    const std::string header = raster_name + ".hdr";
+    HeaderSession session{header.c_str()};
+    describe();
+    AtomicFile side{header.c_str()};
+    if (!side.good() || !session.save(side)) refuse(QUO_WRITE_FAILED, header + ": cannot be written");
+    LinkedRaster link{files.measurement, raster_name};
+    if (!side.commit()) refuse(QUO_WRITE_FAILED, header + ": cannot be written");
+    link.keep();
+}
 
 void import_product(const quo_import_request& request, quo_import_result& result) {
     const auto given = [](const char* text) { return std::string{text ? text : ""}; };
     const std::string raster_name = request.raster, header = raster_name + ".hdr";
     const Sentinel1Files files =
         find_sentinel1_files(request.source, given(request.swath), given(request.polarization));
+    require_apart(request, files);
     const auto product = std::make_unique<Sentinel1Product>();
     describe_sentinel1(files, given(request.orbit_file), *product);
     const auto measurement = open_measurement(files.measurement, *product);
 
     BufferFile& raster = product->header.bufferFile;
     describe_raster(*measurement, request.raster, raster);
-    HeaderSession session{header.c_str()};
-    PatternFiles pattern{raster_name + ".antenna"};
-    const auto describe = [&](const BufferFile& made) {
-        if (&made != &raster) raster.clone(&made);
+    PatternRaster pattern{raster_name + ".antenna", product->header.antennaPattern};
+    const auto describe = [&] {
         product->header.GSenable(gsBufferFile);
         write_mission_header(*product, header);
     };
     if (request.link != 0) {
-        if (measurement->plain_from < 0 || measurement->plain_from > std::numeric_limits<std::int32_t>::max() ||
-            measurement->type == MeasuredType::kUnsignedShort)
-            refuse(QUO_REFUSED, files.measurement +
-                                    ": its samples cannot be used where they are; import without a "
-                                    "link");
-        raster.HeaderOffset = measurement->plain_from;
-        raster.ByteOrder = measurement->big_endian ? 1 : 0;
-        describe(raster);
-        pattern.write(product->header.antennaPattern);
-        link_samples(files.measurement, raster_name);
-        if (const int status = session.commit()) refuse(status, header + ": cannot be written");
+        link_product(files, *measurement, raster_name, raster, describe);
     } else {
         BufferFile copy;
         copy.clone(&raster);
         copy_samples(request, *measurement, copy);
-        describe(copy);
-        pattern.write(product->header.antennaPattern);
+        const HeaderSession session{header.c_str()};
+        describe();
         if (const int status = copy.commit()) refuse(status, raster_name + ": cannot be written");
     }
-    pattern.keep();
+    pattern.commit();
     result.lines = product->lines;
     result.samples = product->samples;
     result.linked = request.link != 0 ? 1 : 0;
@@ -250,14 +304,14 @@ void import_product(const quo_import_request& request, quo_import_result& result
 
 int quo_import_sentinel1(const quo_import_request* request, quo_import_result* result) noexcept {
     quo::CallFrame frame{"quo_import_sentinel1", quo::kSource};
-    if (!request || !result || quo::text_or_empty(request->source).empty() ||
-        quo::text_or_empty(request->raster).empty())
-        return frame.fail(QUO_REFUSED, "The product or the raster has no name");
+    if (!result) return frame.fail(QUO_REFUSED, "There is no place for the result");
     *result = {};
     const auto fail = [&](int status, const char* line) {
         quo::copy_bounded(result->message, line);
         return frame.fail(status, line);
     };
+    if (!request || quo::text_or_empty(request->source).empty() || quo::text_or_empty(request->raster).empty())
+        return fail(QUO_REFUSED, "The product or the raster has no name");
     try {
         quo::import_product(*request, *result);
         return frame.success();

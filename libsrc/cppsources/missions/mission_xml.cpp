@@ -3,6 +3,7 @@
 #include <libxml/parser.h>
 #include <libxml/tree.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <charconv>
 #include <cmath>
@@ -18,9 +19,8 @@ namespace {
 /** A text that belongs to libxml2. */
 std::string taken(xmlChar* text) {
     if (!text) return {};
-    std::string copy{trimmed(reinterpret_cast<const char*>(text))};
-    xmlFree(text);
-    return copy;
+    const std::unique_ptr<xmlChar, void (*)(void*)> own{text, xmlFree};
+    return std::string{trimmed(reinterpret_cast<const char*>(text))};
 }
 
 _xmlNode* child(_xmlNode* node, std::string_view name) {
@@ -53,9 +53,12 @@ MissionXml::MissionXml(const std::string& file) : name_{file}, document_{nullptr
     const auto bytes = file_length(file.c_str());
     if (!bytes) throw MissionRefusal{QUO_NOT_OPENED, file + ": cannot be opened"};
     if (*bytes > kMostBytes) throw MissionRefusal{QUO_REFUSED, file + ": is too long for a product's description"};
-    xmlDoc* const document = xmlReadFile(file.c_str(), nullptr,
-                                         XML_PARSE_NONET | XML_PARSE_NOBLANKS | XML_PARSE_COMPACT |
-                                             XML_PARSE_NOERROR | XML_PARSE_NOWARNING | XML_PARSE_NOCDATA);
+    // By its bytes: a name would be read as an address, and what is compressed would be unpacked without a bound.
+    const auto text = read_file(file.c_str(), kMostBytes);
+    if (!text) throw MissionRefusal{QUO_READ_FAILED, file + ": cannot be read"};
+    xmlDoc* const document = xmlReadMemory(text->data(), static_cast<int>(text->size()), nullptr, nullptr,
+                                           XML_PARSE_NONET | XML_PARSE_NOBLANKS | XML_PARSE_COMPACT |
+                                               XML_PARSE_NOERROR | XML_PARSE_NOWARNING | XML_PARSE_NOCDATA);
     errno = 0;
     document_ = document;
     if (!document || !xmlDocGetRootElement(document) || document->intSubset) {

@@ -69,7 +69,7 @@ public:
     [[nodiscard]] Element root() const;
     [[nodiscard]] const std::string& name() const { return name_; }
 
-    static constexpr std::int64_t kMostBytes = 256 << 20;
+    static constexpr std::int64_t kMostBytes = 64 << 20;
 
 private:
     std::string name_;

@@ -44,6 +44,7 @@ void set_orbit(GeneralSAR& product, const std::vector<MissionVector>& vectors, c
         times.push_back(vector.time.after(first.whole_s) - first.fraction_s);
         off_s = std::max(off_s, std::abs(times.back() - on_raster_s));
     }
+    if (off_s > 1e-3) throw MissionRefusal{QUO_REFUSED, source + ": its state vectors are not one spacing apart"};
     GeneralSAROrbit& orbit = product.orbit;
     require(orbit.SVCreate(first.seconds(), step_s, static_cast<int>(vectors.size())), source, kNone);
     fill(orbit, vectors);

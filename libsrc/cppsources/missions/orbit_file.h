@@ -17,7 +17,7 @@ struct MissionVector {
 };
 
 /** Gives a product its orbit: at least five vectors in the order of their times, which may be off their raster by
- * the microsecond that the files round to. Refused, with `source` in the line, where they make no orbit. */
+ * a millisecond: files round to the microsecond. Refused, with `source` in the line, where they make no orbit. */
 void set_orbit(GeneralSAR& product, const std::vector<MissionVector>& vectors, const std::string& source);
 
 /** The vectors of an orbit file from `margin_s` before `first` to as long after `last`, "S1A" being the satellite.

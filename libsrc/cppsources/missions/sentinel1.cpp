@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <functional>
 #include <numbers>
 #include <span>
 #include <vector>
@@ -259,10 +260,13 @@ double far_time(const Annotation& a, const ImageGrid_Obj& grid) {
 void set_region(const Annotation& a, const ImageGrid_Obj& grid, GeneralSAR& product) {
     ROI_Obj& region = product.roi.Roi;
     const double length_s = a.last_line.after(grid.Epoch_s) - grid.FirstLine_s;
-    region.SetSlowAxe(a.first_line.seconds(), grid.LineStep_s,
-                      static_cast<int>(std::lround(length_s / grid.LineStep_s)) + 1);
+    const double lines = std::round(length_s / grid.LineStep_s) + 1.0;
+    constexpr double kMostLines = 1e9;
+    if (!(lines >= 1.0 && lines < kMostLines)) a.root.refuse("first and last line make no image");
+    region.SetSlowAxe(a.first_line.seconds(), grid.LineStep_s, static_cast<int>(lines));
     const double step_s =
         a.detected ? (far_time(a, grid) - a.near_s) / std::max(1, a.samples - 1) : grid.SampleStep_s;
+    if (!(step_s > 0.0 || a.samples == 1)) a.root.refuse("near and far range make no image");
     region.SetFastAxe(a.near_s, step_s, a.samples);
     product.GSenable(gsRoi);
     if (product.orbit.SVGetGeoCoords(&product.geoCoords, &product.roi) == QUO_OK) product.GSenable(gsGeoCoords);
@@ -372,7 +376,8 @@ void set_pattern(const Annotation& a, const ImageGrid_Obj& grid, AntennaPattern_
     };
     const Element nearest = *std::ranges::min_element(all, {}, off_middle);
     const auto angles = nearest.numbers("elevationAngle"), parts = nearest.numbers("elevationPattern");
-    if (angles.size() < 2 || parts.size() != 2 * angles.size() || !std::ranges::is_sorted(angles) ||
+    if (angles.size() < 2 || parts.size() != 2 * angles.size() ||
+        std::ranges::adjacent_find(angles, std::greater_equal{}) != angles.end() ||
         angles.size() > static_cast<std::size_t>(AntennaPattern_Obj::kMaxPatternSamples))
         nearest.refuse("the antenna pattern has no real and imaginary part for every angle, or too many");
     pattern.PatternSamples = static_cast<std::int32_t>(angles.size());
@@ -445,6 +450,7 @@ public:
         squares_ += difference * difference;
         most_ = std::max(most_, std::abs(difference));
     }
+    [[nodiscard]] int count() const { return count_; }
     void tell(double& rms, double& most) const {
         rms = std::sqrt(squares_ / std::max(1, count_));
         most = most_;
@@ -471,13 +477,14 @@ quo_tie_points compare(const TiePoints& ties, const ImageGrid_Obj& grid, const G
         return told;
     Differences lines, columns, places;
     for (std::size_t i = 0; i < n; ++i) {
+        if (std::isnan(first[i]) || std::isnan(x[i])) continue;  // in no burst
         const double off = first[i] - ties.line[i], other = second[i] - ties.line[i];
         lines.add(std::abs(other) < std::abs(off) ? other : off);
         columns.add(sample[i] - ties.sample[i]);
         const Vec3 stated = from_geodetic({ties.latitude[i], ties.longitude[i], ties.height_m[i]});
         places.add(norm(Vec3{x[i], y[i], z[i]} - stated));
     }
-    told.count = static_cast<std::int32_t>(n);
+    told.count = lines.count();
     lines.tell(told.rms_line, told.most_line);
     columns.tell(told.rms_sample, told.most_sample);
     places.tell(told.rms_ground_m, told.most_ground_m);

@@ -58,7 +58,8 @@ fs::path choose(const std::vector<fs::path>& all, const std::string& source, con
     if (fitting.empty())
         throw MissionRefusal{QUO_REFUSED, source + ": no such swath and polarization; there are " + offered};
     if (fitting.size() > 1)
-        throw MissionRefusal{QUO_REFUSED, source + ": choose a swath and a polarization of " + offered};
+        throw MissionRefusal{QUO_REFUSED, source + ": choose a swath and a polarization of " + offered +
+                                              ", or name the annotation"};
     return fitting.front();
 }
 
@@ -70,21 +71,26 @@ Sentinel1Files find_sentinel1_files(const std::string& source, const std::string
     fs::path path{source};
     if (!fs::exists(path, error)) throw MissionRefusal{QUO_NOT_OPENED, source + ": cannot be opened"};
     if (path.filename() == "manifest.safe") path = path.parent_path().empty() ? fs::path{"."} : path.parent_path();
+    if (!fs::is_directory(path, error) && !is_annotation(path))
+        throw MissionRefusal{QUO_REFUSED,
+                             source + ": is neither a product's folder, its manifest nor an annotation"};
     const fs::path annotation = fs::is_directory(path, error)
                                     ? choose(annotations_in(path / "annotation"), source, swath, polarization)
                                     : choose({path}, source, swath, polarization);
-    const fs::path product = annotation.parent_path() / "..";
+    const fs::path folder = annotation.parent_path();
+    const fs::path product = folder.empty()             ? fs::path{".."}
+                             : folder.has_parent_path() ? folder.parent_path()
+                                                        : fs::path{"."};
     Sentinel1Files files{annotation.string(), "", ""};
     for (const char* const ending : {".tiff", ".tif"}) {
         const fs::path measurement = product / "measurement" / (annotation.stem().string() + ending);
-        if (files.measurement.empty() && fs::exists(measurement, error))
-            files.measurement = measurement.lexically_normal().string();
+        if (files.measurement.empty() && fs::exists(measurement, error)) files.measurement = measurement.string();
     }
     if (files.measurement.empty())
         throw MissionRefusal{QUO_NOT_OPENED, files.annotation + ": its measurement ../measurement/" +
                                                  annotation.stem().string() + ".tiff is missing"};
     const fs::path manifest = product / "manifest.safe";
-    if (fs::exists(manifest, error)) files.manifest = manifest.lexically_normal().string();
+    if (fs::exists(manifest, error)) files.manifest = manifest.string();
     return files;
 }
 

@@ -90,6 +90,7 @@ private:
 
     const char* lay_out() {
         constexpr std::uint32_t kMostTile = 1 << 16;
+        constexpr std::uint64_t kMostTileBytes = 1 << 26;
         tiled_ = TIFFIsTiled(tiff_) != 0;
         std::uint32_t rows = 0;
         if (tiled_) {
@@ -97,12 +98,14 @@ private:
             TIFFGetField(tiff_, TIFFTAG_TILELENGTH, &rows);
             if (tile_width_ == 0 || tile_width_ > kMostTile || rows == 0 || rows > kMostTile)
                 return "its tiles have no size that is believed";
+            const std::uint64_t bytes = std::uint64_t{tile_width_} * rows * bytes_of(type);
+            if (bytes > kMostTileBytes || static_cast<std::uint64_t>(TIFFTileSize(tiff_)) != bytes)
+                return "its tiles have no size that is believed";
             try {
                 tile_.resize(static_cast<std::size_t>(tile_width_) * rows * bytes_of(type));
             } catch (const std::bad_alloc&) {
                 return "there is no memory for its tiles";
             }
-            if (static_cast<std::size_t>(TIFFTileSize(tiff_)) != tile_.size()) return "its tiles have no size";
         } else {
             TIFFGetFieldDefaulted(tiff_, TIFFTAG_ROWSPERSTRIP, &rows);
             if (rows == 0) return "its strips have no lines";
@@ -114,9 +117,10 @@ private:
 
     /** Where the lines begin, if the strips hold them as they are and follow each other without a gap. */
     [[nodiscard]] std::int64_t find_plain() const {
-        std::uint16_t compression = COMPRESSION_NONE;
+        std::uint16_t compression = COMPRESSION_NONE, order = FILLORDER_MSB2LSB;
         TIFFGetFieldDefaulted(tiff_, TIFFTAG_COMPRESSION, &compression);
-        if (tiled_ || compression != COMPRESSION_NONE) return -1;
+        TIFFGetFieldDefaulted(tiff_, TIFFTAG_FILLORDER, &order);
+        if (tiled_ || compression != COMPRESSION_NONE || order != FILLORDER_MSB2LSB) return -1;
         const std::uint64_t first = TIFFGetStrileOffset(tiff_, 0);
         std::uint64_t next = first;
         const std::int32_t blocks = (lines - 1) / block_lines + 1;
@@ -133,7 +137,7 @@ private:
 
     /** What was never written of an image is not in its file, and is 0. */
     bool fill_absent(std::uint32_t strile, void* to, tmsize_t bytes) noexcept {
-        if (TIFFGetStrileByteCount(tiff_, strile) != 0) return false;
+        if (TIFFGetStrileByteCount(tiff_, strile) != 0 || TIFFGetStrileOffset(tiff_, strile) != 0) return false;
         std::memset(to, 0, static_cast<std::size_t>(bytes));
         return true;
     }

@@ -114,7 +114,9 @@ private:
     bool begin_element() {
         in_.fill();
         if (!in_.take("<") || !is(kNameStart, *in_.at) || open_.size() > kDeepest) return false;
-        const std::uint32_t name = name_place(in_.take_all(kNameCharacter));
+        const std::string_view text = in_.take_all(kNameCharacter);
+        if (text.size() > kLongestName) return false;
+        const std::uint32_t name = name_place(text);
         const Node element = tree_.append(open_.empty() ? Node::none : open_.back(), NodeKind::element, name);
         if (*in_.at == ' ' && !take_attribute(element)) return false;
         if (in_.take(">")) {
@@ -125,7 +127,10 @@ private:
     }
     bool take_attribute(Node element) {
         const char* const first = in_.at++;
-        if (!is(kNameStart, *in_.at) || in_.take_all(kNameCharacter) == "xmlns" || !in_.take("=\"")) return false;
+        if (!is(kNameStart, *in_.at)) return false;
+        const std::string_view name = in_.take_all(kNameCharacter);
+        kept_names_ += name.size();
+        if (name == "xmlns" || name.size() > kLongestName || !in_.take("=\"")) return false;
         in_.take_all(kValueCharacter);
         if (!in_.take("\"")) return false;
         tree_.set_attributes(element, tree_.keep({first, static_cast<std::size_t>(in_.at - first)}));
@@ -146,6 +151,8 @@ private:
         }
         return place;
     }
+
+    static constexpr std::size_t kLongestName = 50'000;  // that the parser takes
 
     Window in_;
     HeaderTree& tree_;

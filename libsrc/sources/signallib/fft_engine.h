@@ -45,6 +45,8 @@ public:
      * at least. False when the engine failed, which fills `why`. Any number of threads may run a batch at a time.
      */
     virtual bool run(const float* in, float* out, FftFailure& why) noexcept = 0;
+    /** Memory that it holds on to between runs, bytes. */
+    [[nodiscard]] virtual std::size_t held_bytes() const noexcept { return 0; }
 };
 
 /** What computes the transforms. Lives until the process ends. */
@@ -64,8 +66,8 @@ public:
     [[nodiscard]] virtual bool wants_tile(const FftGeometry& columns) const noexcept {
         return columns.length == 0;
     }
-    /** Null when the batch cannot be had, which fills `why`. Takes memory of its own to measure on. Any thread may
-     * ask. */
+    /** Null when the batch cannot be had, which fills `why`. Where it measures, it does so on memory of its own.
+     * Any thread may ask. */
     [[nodiscard]] virtual std::unique_ptr<FftBatch> make(const FftGeometry& geometry,
                                                          FftFailure& why) noexcept = 0;
 };
@@ -74,7 +76,7 @@ public:
 
 /** The module's only exported function. Null for another version of the interface than its own. */
 using FftwEntry = FftEngine* (*)(int interface_version);
-inline constexpr int kFftInterfaceVersion = 3;
+inline constexpr int kFftInterfaceVersion = 4;
 inline constexpr const char* kFftwEntryName = "quo_base_fftw_engine";
 
 /** Loads the module: from `file`, or where that is null from the folder of this library, quo_base/ below it first.

@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "signallib/fft_transform.h"
+#include "signallib/memory_room.h"
 #include "signallib/spare_floats.h"
 
 namespace quo {
@@ -20,9 +21,11 @@ Value scaled(Value a, float by) { return {a.re * by, a.im * by}; }
 
 /** The complex transforms that do the work, side by side in room of their own, as the real ones lie. */
 FftGeometry complex_geometry(const FftGeometry& real) {
-    constexpr int kGroup = 16;
-    const int length = real.length % 2 == 0 ? real.length / 2 : real.length, count = std::min(kGroup, real.count);
+    constexpr int kGroup = 16, kGroupSamples = 1 << 16;
+    const int length = real.length % 2 == 0 ? real.length / 2 : real.length;
     const bool rows = real.stride == 1;
+    // Rows that are too long for a cache gain nothing from others beside them.
+    const int count = std::min(rows ? std::clamp(kGroupSamples / length, 1, kGroup) : kGroup, real.count);
     return {FftDomain::Complex, length, count, rows ? 1 : count, rows ? length : 1, real.forward, true};
 }
 
@@ -57,6 +60,7 @@ public:
             if (batch.width < block_) std::fill_n(room.get(), floats_, 0.0F);
             geometry_.forward ? batch.take_samples(in + offset) : take_spectrum(batch, in + offset);
             done = complex_->run_all(room.get(), room.get(), {});
+            if (!done) break;
             geometry_.forward ? give_spectrum(batch, out + offset) : batch.give_samples(out + offset);
             multiply_batch(geometry_, out + offset, batch.width, factors);
         }
@@ -164,6 +168,13 @@ private:
 std::unique_ptr<FftTransform> make_packed_real(FftEngine& engine, const FftGeometry& geometry) {
     std::unique_ptr<FftTransform> complex = make_fft_transform(engine, complex_geometry(geometry));
     if (!complex) return nullptr;
+    const FftGeometry& work = complex->geometry();
+    const std::size_t bytes =
+        2 * sizeof(float) * static_cast<std::size_t>(work.length) * static_cast<std::size_t>(work.count);
+    if (!has_room({bytes, bytes})) {
+        note_fft_error(engine, geometry.length, {.bytes = bytes});
+        return nullptr;
+    }
     return std::make_unique<PackedReal>(engine, geometry, std::move(complex));
 }
 

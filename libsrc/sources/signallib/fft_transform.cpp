@@ -48,6 +48,9 @@ public:
         ready_ = make(whole_, block) && (left == 0 || make(rest_, with_count(block, left)));
     }
     [[nodiscard]] bool ready() const { return ready_; }
+    [[nodiscard]] std::size_t held_bytes() const noexcept {
+        return (whole_ ? whole_->held_bytes() : 0) + (rest_ ? rest_->held_bytes() : 0);
+    }
 
     /** Whole blocks, or as many transforms as are left at the end. */
     [[nodiscard]] bool run(int count, const float* in, float* out) const noexcept {
@@ -77,7 +80,7 @@ public:
     BlockedTransform(FftEngine& engine, const FftGeometry& geometry, int block)
         : FftTransform{geometry, block}, batches_{engine, with_count(geometry, block), geometry.count} {}
     [[nodiscard]] bool ready() const { return batches_.ready(); }
-    [[nodiscard]] std::size_t held_bytes() const noexcept override { return 0; }
+    [[nodiscard]] std::size_t held_bytes() const noexcept override { return batches_.held_bytes(); }
 
     bool run(const float* in, float* out, int first, int count, FftFactors factors) noexcept override {
         for (int k = first; k < first + count; k += block_) {
@@ -107,7 +110,7 @@ public:
         if (batches_.ready() && !fits_) note_fft_error(engine_, geometry_.length, {.bytes = bytes_});
     }
     [[nodiscard]] bool ready() const { return fits_; }
-    [[nodiscard]] std::size_t held_bytes() const noexcept override { return bytes_; }
+    [[nodiscard]] std::size_t held_bytes() const noexcept override { return bytes_ + batches_.held_bytes(); }
 
     bool run(const float* in, float* out, int first, int count, FftFactors factors) noexcept override {
         Floats tile = tiles_.take();

@@ -125,6 +125,8 @@ public:
         return done;
     }
 
+    [[nodiscard]] std::size_t held_bytes() const noexcept override { return floats() * sizeof(float); }
+
 private:
     static constexpr int kGroup = 8;
 

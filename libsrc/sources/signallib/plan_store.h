@@ -12,7 +12,7 @@
 
 namespace quo {
 
-/** The plans of the process, for all threads: those that callers hold, by handles, and those that were measured
+/** The plans of the process, for all threads: those that callers hold, by handles, and those that were used
  * last, to be had again for nothing. */
 class PlanStore {
 public:
@@ -40,7 +40,7 @@ private:
     void keep(FftEngine& engine, const std::shared_ptr<FftTransform>& transform);
 
     HandleTable<FftEnginePlan, FftTransform> held_{0x51A7'0000'0001};
-    mutable std::mutex guard_;  ///< of what is kept; never held while a transform is measured or runs
+    mutable std::mutex guard_;  ///< of what is kept; never held while a transform is made or runs
     std::vector<Kept> kept_;    ///< the one used last stands first
     std::size_t kept_bytes_ = 0;
 };

@@ -1,7 +1,10 @@
 #include "pixels.h"
 
+#include <cmath>
+
 #include "failure.h"
 #include "product.h"
+#include "quo_base/derived_raster.h"
 #include "scene.h"
 
 namespace tool {
@@ -14,8 +17,10 @@ double distance(const GrPtGeometry& a, const GrPtGeometry& b) {
 }  // namespace
 
 bool take_grid(const std::string& header, const GeneralSAR& product, ImageGrid_Obj& grid) {
-    if (grid.readhdr(header.c_str()) == QUO_OK) return true;
-    return product.GSexists(gsRoi) && product.roi.Roi.isNULL() == 0 && grid.setRegion(product.roi.Roi) == QUO_OK;
+    const int status = read_image_grid(header.c_str(), product, grid);
+    if (status != QUO_OK && status != QUO_REFUSED)
+        throw Failure(header + ": section ImageGrid: " + status_text(status));
+    return status == QUO_OK;
 }
 
 Pixels::Pixels(const std::string& header, GeneralSAR& product) : product_{product} {
@@ -55,7 +60,11 @@ std::optional<GrPtGeometry> Pixels::geometry(double line, double sample) const {
 
 std::optional<Pixels::Spacing> Pixels::ground_spacing() const {
     const double line = 0.5 * (lines_ - 1), sample = 0.5 * (samples_ - 1);
-    const auto here = geometry(line, sample), below = geometry(line + 1.0, sample),
+    const auto at = times(line, sample), next = times(line + 1.0, sample);
+    // The line after the last one of a burst lies somewhere else.
+    const bool goes_on =
+        at && next && std::abs(next->azimuth_s - at->azimuth_s - grid_.LineStep_s) < 0.5 * grid_.LineStep_s;
+    const auto here = geometry(line, sample), below = geometry(goes_on ? line + 1.0 : line - 1.0, sample),
                beside = geometry(line, sample + 1.0);
     if (!here || !below || !beside) return std::nullopt;
     return Spacing{distance(*here, *below), distance(*here, *beside)};

@@ -150,7 +150,8 @@ void to_radar(const Scene& scene, GeneralSAROrbit& own, Points& points) {
     refuse_hidden(own, points);
 }
 
-/** Finds the pixels of the times that were found; a point whose times have none is not seen by the image. */
+/** Finds the pixels of the times that were found; a point that no burst sees, or no ground range, is not seen by
+ * the image. Others may lie beside it. */
 void find_pixels(const Scene& scene, Points& points) {
     std::vector<std::int32_t> outside(points.count());
     const TimePixels pixels{points.out[2].data(), points.second_line.data(), points.out[3].data(), outside.data()};
@@ -362,10 +363,11 @@ private:
         for (std::size_t k = 0; k < direction_->outputs.size(); ++k) {
             text += ',';
             if (status != 0) continue;
-            if (k == iso_at_)
-                text += iso_text(points_.out[k][i]);
-            else
+            const std::string date = k == iso_at_ ? iso_text(points_.out[k][i]) : "";  // none before 1985
+            if (date.empty())
                 append_exact(text, points_.out[k][i]);
+            else
+                text += date;
         }
         text.append(",").append(std::to_string(status)).append("\n");
     }

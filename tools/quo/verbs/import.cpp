@@ -1,4 +1,3 @@
-#include <cstdio>
 #include <memory>
 #include <optional>
 
@@ -22,8 +21,8 @@ struct Watch {
 
     static int step(void* self, std::int64_t done, std::int64_t all) {
         auto& watch = *static_cast<Watch*>(self);
-        watch.progress.show(done, all, done);
         try {
+            watch.progress.show(done, all, done);
             throw_if_interrupted();
         } catch (const Interrupted& signal) {
             watch.interrupted = signal;
@@ -37,17 +36,19 @@ struct Watch {
 };
 
 void show(const ImportOptions& options, const quo_import_result& result) {
-    std::printf("%s: %d lines of %d samples%s\n", options.raster.c_str(), result.lines, result.samples,
-                result.linked != 0 ? ", linked" : "");
+    std::string text = shown(options.raster) + ": " + std::to_string(result.lines) + " lines of " +
+                       std::to_string(result.samples) + " samples" + (result.linked != 0 ? ", linked" : "") + "\n";
     const quo_tie_points& ties = result.ties;
     if (ties.count > 0)
-        std::printf(
-            "%d tie points: lines rms %.5f max %.5f, samples rms %.5f max %.5f, ground rms %.4f m max %.4f m\n",
-            ties.count, ties.rms_line, ties.most_line, ties.rms_sample, ties.most_sample, ties.rms_ground_m,
-            ties.most_ground_m);
+        text += std::to_string(ties.count) + " tie points: lines rms " + fixed(ties.rms_line, 5) + " max " +
+                fixed(ties.most_line, 5) + ", samples rms " + fixed(ties.rms_sample, 5) + " max " +
+                fixed(ties.most_sample, 5) + ", ground rms " + fixed(ties.rms_ground_m, 4) + " m max " +
+                fixed(ties.most_ground_m, 4) + " m\n";
+    print(text);
 }
 
 int import_product(const ImportOptions& options) {
+    if (options.raster == "-") throw WrongUse("a raster cannot go to standard output");
     require_apart({options.source, options.orbit}, raster_files(options.raster));
     note_interrupts();
     quo_import_request request{};

@@ -10,6 +10,7 @@
 #include "commands.h"
 #include "interrupt.h"
 #include "progress.h"
+#include "quo_base/image_grid.h"
 #include "quo_base/interp.h"
 #include "raster.h"
 #include "transform.h"
@@ -268,6 +269,9 @@ int resample(const ResampleOptions& options) {
     read_samples_description(options.in, description);
     if (options.centre != 0.0 && description.is_complex() == 0)
         throw WrongUse("--centre: samples that are real have a band around 0");
+    ImageGrid_Obj grid;
+    if (options.lines > 0 && grid.readhdr((options.in + ".hdr").c_str()) == QUO_OK && grid.Bursts > 0)
+        throw Failure(options.in + ": lines of bursts keep their sampling");
     note_interrupts();
     Resampling{options, description}.run();
     return kFine;

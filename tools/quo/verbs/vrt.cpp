@@ -45,20 +45,24 @@ struct Controls {
 
 std::vector<double> even_places(int length, int count) {
     std::vector<double> places;
-    for (int i = 0; i < count; ++i)
-        places.push_back((length - 1) * static_cast<double>(i) / std::max(1, count - 1));
+    for (int i = 0; i < std::min(length, count); ++i)
+        places.push_back((length - 1) * static_cast<double>(i) / std::max(1, std::min(length, count) - 1));
     return places;
 }
 
-/** Of bursts every burst's first and last line: between two bursts the ground goes back. */
+/** Of bursts every burst's first and last line in the raster: between two bursts the ground goes back. */
 std::vector<double> line_places(const Pixels& pixels, int count) {
     const ImageGrid_Obj& grid = pixels.grid();
     if (grid.Bursts == 0) return even_places(pixels.lines(), count);
     std::vector<double> places;
-    for (int burst = 0; burst < grid.Bursts; ++burst)
-        for (const int line : {burst * grid.LinesPerBurst, (burst + 1) * grid.LinesPerBurst - 1})
-            if (const double place = line - grid.FirstLine; place >= 0.0 && place < pixels.lines())
-                places.push_back(place);
+    for (int burst = 0; burst < grid.Bursts; ++burst) {
+        const double start = static_cast<double>(burst) * grid.LinesPerBurst - grid.FirstLine;
+        const double first = std::max(start, 0.0),
+                     last = std::min(start + grid.LinesPerBurst - 1.0, pixels.lines() - 1.0);
+        if (first > last) continue;
+        places.push_back(first);
+        if (last > first) places.push_back(last);
+    }
     return places;
 }
 
@@ -88,7 +92,11 @@ double interpolation_error(const Pixels& pixels, const Controls& controls) {
         for (std::size_t j = 0; j + 1 < controls.samples.size(); ++j) {
             const Control &a = controls.at(i, j), &b = controls.at(i, j + 1), &c = controls.at(i + 1, j),
                           &d = controls.at(i + 1, j + 1);
-            if (c.line - a.line <= 1.0) continue;  // from one burst to the next
+            const double lines_per_burst = pixels.grid().Bursts > 0 ? pixels.grid().LinesPerBurst : HUGE_VAL;
+            const auto burst_of = [&](double line) {
+                return std::floor((line + pixels.grid().FirstLine + 0.5) / lines_per_burst);
+            };
+            if (burst_of(a.line) != burst_of(c.line)) continue;
             const auto truth =
                 control_at(pixels, 0.5 * (a.line + c.line), 0.5 * (a.sample + b.sample), a.longitude_deg);
             if (!truth) continue;

@@ -1,7 +1,10 @@
 #include "quo_base/derived_raster.h"
 
+#include <algorithm>
 #include <cmath>
+#include <cstdint>
 #include <memory>
+#include <optional>
 #include <string>
 
 #include "diagnosticslib/call_frame.h"
@@ -17,6 +20,29 @@ constexpr const char* kSource = "derived_raster";
 
 bool almost(double a, double b) { return std::abs(a - b) <= 1e-9 * std::abs(b); }
 
+/** The raster that a header describes, in whichever form. */
+const RasterDescription& described(const GeneralSAR& product) {
+    if (product.GSexists(gsBufferFile)) return product.bufferFile;
+    return product.dataFile.File;
+}
+
+/** Line times, without the delay that belongs to zero-Doppler times, and range times of an image's border. */
+struct Border {
+    double first_s = 0.0, last_s = 0.0, near_s = 0.0, far_s = 0.0;
+};
+std::optional<Border> border_of(const ImageGrid_Obj& grid, const RasterDescription& raster) {
+    ImageGrid_Obj lines;
+    if (grid.clone(&lines) != QUO_OK) return std::nullopt;
+    lines.DelayShare = 0.0;
+    const double last_line = raster.NrOfLinesPerImage - 1.0, last_sample = raster.NrOfPixelsPerLine - 1.0;
+    const double line[] = {0.0, last_line, 0.0}, sample[] = {0.0, 0.0, last_sample};
+    double azimuth_s[3], range_s[3];
+    std::int32_t status[3];
+    if (lines.pixelTimes({3, line, sample}, {azimuth_s, range_s, status}) != QUO_OK) return std::nullopt;
+    if (status[0] != QUO_OK || status[1] != QUO_OK || status[2] != QUO_OK) return std::nullopt;
+    return Border{azimuth_s[0], azimuth_s[1], range_s[0], range_s[2]};
+}
+
 /** The sections of a product that place its raster, made to fit a derived one. */
 class Placed {
 public:
@@ -25,52 +51,58 @@ public:
 
     /** Of a header that has neither grid nor region nothing is written. */
     int write(const char* from, const char* header) {
-        ROI_Obj& region = product_.roi.Roi;
-        const bool has_region = product_.GSexists(gsRoi) && region.isNULL() == 0;
-        ImageGrid_Obj grid;
-        if (grid.readhdr(from) != QUO_OK && (!has_region || grid.setRegion(region) != QUO_OK)) return QUO_OK;
-        const int status = grid.cut(how_.first_line, how_.first_sample, how_.line_step, how_.sample_step);
+        const int found = read_image_grid(from, product_, grid_);
+        if (found != QUO_OK) return found == QUO_REFUSED ? QUO_OK : found;
+        change_rates(product_.samplingConstants);
+        const int status = grid_.cut(how_.first_line, how_.first_sample, how_.line_step, how_.sample_step);
         if (status != QUO_OK) return status;
-        if (has_region && fits(region)) move_region(region, grid);
-        if (product_.GSexists(gsSamplingConstants)) change_rates(product_.samplingConstants);
-        grid.setExactNumbers(true);
-        region.setExactNumbers(true);
-        if (const int failed = grid.writehdr(header)) return failed;
+        if (product_.GSexists(gsRoi)) move_region(product_.roi.Roi);
+        for (GeneralSAR_Base* const object :
+             {static_cast<GeneralSAR_Base*>(&grid_), static_cast<GeneralSAR_Base*>(&product_.roi.Roi),
+              static_cast<GeneralSAR_Base*>(&product_.samplingConstants)})
+            object->setExactNumbers(true);
+        if (const int failed = grid_.writehdr(header)) return failed;
         return write_changed(header);
     }
 
 private:
-    [[nodiscard]] bool fits(const ROI_Obj& region) const {
-        const RasterDescription* const old = product_.GSexists(gsBufferFile)
-                                                 ? static_cast<const RasterDescription*>(&product_.bufferFile)
-                                                 : &product_.dataFile.File;
-        return region.Lines == old->NrOfLinesPerImage && region.Samples == old->NrOfPixelsPerLine;
-    }
-    void move_region(ROI_Obj& region, const ImageGrid_Obj& grid) {
-        line_interval_s_ = region.SlowTimeDelta;
-        region.SetSlowAxe(grid.Bursts == 0 ? grid.Epoch_s + (grid.FirstLine_s + grid.FirstLine * grid.LineStep_s)
-                                           : region.SlowStartTime + how_.first_line * region.SlowTimeDelta,
-                          region.SlowTimeDelta * how_.line_step, raster_.NrOfLinesPerImage);
-        region.SetFastAxe(region.FastStartTime + how_.first_sample * region.FastTimeDelta,
-                          region.FastTimeDelta * how_.sample_step, raster_.NrOfPixelsPerLine);
+    void move_region(ROI_Obj& region) {
+        const auto border = border_of(grid_, raster_);
+        if (!border) return;
+        // Bursts overlap: their lines are more than the time that they cover has room for.
+        const int lines =
+            grid_.Bursts == 0
+                ? raster_.NrOfLinesPerImage
+                : static_cast<int>(std::lround((border->last_s - border->first_s) / grid_.LineStep_s)) + 1;
+        const double samples = std::max(1.0, raster_.NrOfPixelsPerLine - 1.0);
+        region.SetSlowAxe(border->first_s, grid_.LineStep_s, lines);
+        region.SetFastAxe(border->near_s,
+                          grid_.GroundLists == 0 ? grid_.SampleStep_s : (border->far_s - border->near_s) / samples,
+                          raster_.NrOfPixelsPerLine);
         moved_ = true;
     }
+    /** Those that are the image's own: of ground range, and of multilooked or burst images, they are the
+     * recording's. */
     void change_rates(SamplingConstants_Obj& sampling) {
-        if (how_.sample_step != 1.0 && sampling.Trg_s > 0.0) {
+        if (!product_.GSexists(gsSamplingConstants)) return;
+        if (how_.sample_step != 1.0 && grid_.GroundLists == 0 && almost(sampling.Trg_s, grid_.SampleStep_s)) {
             sampling.Trg_s *= how_.sample_step;
             sampling.frg_hz = 1.0 / sampling.Trg_s;
+            rates_ = true;
         }
-        // Of a multilooked or burst image the lines are not the pulses.
-        if (how_.line_step != 1.0 && sampling.pri_s > 0.0 && almost(sampling.pri_s, line_interval_s_)) {
+        if (how_.line_step != 1.0 && almost(sampling.pri_s, grid_.LineStep_s)) {
             sampling.pri_s *= how_.line_step;
             sampling.prf_hz = 1.0 / sampling.pri_s;
+            rates_ = true;
         }
     }
     int write_changed(const char* header) {
         if (moved_) (void)product_.roi.writehdr(header);
-        if (product_.GSexists(gsSamplingConstants) && (how_.line_step != 1.0 || how_.sample_step != 1.0))
+        if (rates_)
             if (const int status = product_.samplingConstants.writehdr(header)) return status;
+        // The data set tells the look side.
         const bool corners = moved_ && product_.GSexists(gsGeoCoords) && product_.GSexists(gsOrbit) &&
+                             product_.GSexists(gsDataSetInfo) &&
                              product_.orbit.SVGetGeoCoords(&product_.geoCoords, &product_.roi) == QUO_OK;
         return corners ? product_.geoCoords.writehdr(header) : QUO_OK;
     }
@@ -78,23 +110,45 @@ private:
     GeneralSAR& product_;
     const RasterDescription& raster_;
     const RasterDerivation& how_;
-    double line_interval_s_ = 0.0;
-    bool moved_ = false;
+    ImageGrid_Obj grid_;
+    bool moved_ = false, rates_ = false;
+};
+
+/** The unfinished raster goes, unless it is finished. */
+struct Unfinished {
+    BufferFile& raster;
+    ~Unfinished() { raster.close(); }
 };
 
 }  // namespace
 
+int read_image_grid(const char* header, const GeneralSAR& product, ImageGrid_Obj& grid) noexcept {
+    quo::CallFrame frame{"read_image_grid", kSource};
+    const int status = grid.readhdr(header);
+    if (status != QUO_REFUSED) return status == QUO_OK ? frame.success() : frame.callee(status);
+    const RasterDescription& raster = described(product);
+    const ROI_Obj& region = product.roi.Roi;
+    const bool fits = raster.NrOfLinesPerImage == 0 ||
+                      (region.Lines == raster.NrOfLinesPerImage && region.Samples == raster.NrOfPixelsPerLine);
+    if (!product.GSexists(gsRoi) || region.isNULL() != 0 || !fits) return frame.silent(QUO_REFUSED);
+    if (const int failed = grid.setRegion(region)) return frame.callee(failed);
+    return frame.success();
+}
+
 int commit_derived(BufferFile& raster, const char* header, const RasterDerivation& how) {
     quo::CallFrame frame{"commit_derived", kSource};
+    const Unfinished unfinished{raster};
+    if (!(how.line_step > 0.0 && how.sample_step > 0.0)) return frame.fail(QUO_REFUSED, "The steps are above 0");
     return quo::guarded(frame, [&] {
         char name[512];
         raster.getFilename(name);
         const std::string own = std::string{name} + ".hdr";
         const auto product = std::make_unique<GeneralSAR>();
-        if (product->GSread(header) != QUO_OK) return frame.callee(QUO_REFUSED);
-        quo::HeaderSession session{own.c_str(), header};
+        const quo::HeaderSession source{header};
+        // A product of which a part was lost on the way would be made to fit in a part only.
+        if (product->GSread(header) != QUO_OK || source.failures() > 0) return frame.callee(QUO_REFUSED);
+        const quo::HeaderSession session{own.c_str(), header};
         const int placed = Placed{*product, raster, how}.write(header, own.c_str());
-        if (placed != QUO_OK) raster.close();
         if (placed != QUO_OK) return frame.callee(placed);
         if (const int status = raster.commit()) return frame.callee(status);
         return frame.success();

@@ -18,6 +18,7 @@ constexpr const char* kSource = "image_grid";
 constexpr const char* kNoGrid = "The grid makes no image";
 constexpr const char* kNoArrays = "An array is missing";
 constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
+constexpr double kAbsent = -999.0;  // of the first element, which is read before any other
 
 using Obj = ImageGrid_Obj;
 constexpr quo::FieldTable kTable{
@@ -152,9 +153,12 @@ int Obj::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, kTable.
 
 int Obj::readhdr(const char* file) {
     quo::CallFrame frame{"ImageGrid_Obj::readhdr", kSource};
-    if (!readAuxiliaryFile(file, 1, kTable.section()))
-        return frame.silent(quo::Record::unread(*this) == QUO_NO_MEMORY ? QUO_NO_MEMORY : QUO_REFUSED);
-    return isComplete() ? frame.success() : frame.fail(QUO_REFUSED, kNoGrid);
+    Epoch_s = kAbsent;
+    if (!readAuxiliaryFile(file, 1, kTable.section())) {
+        if (const int status = quo::Record::unread(*this)) return frame.silent(status);
+        return frame.silent(Epoch_s == kAbsent ? QUO_REFUSED : QUO_READ_FAILED);
+    }
+    return isComplete() ? frame.success() : frame.fail(QUO_READ_FAILED, kNoGrid);
 }
 
 int Obj::setRegion(const ROI_Obj& region) {

@@ -360,9 +360,10 @@ int polySAR::CreatePolys(int dc, int fr, int sl2gr, int gr2sl, int sl2theta, int
 int polySAR::CreatePolys(int dc, int fr) { return CreatePolys(dc, fr, 0, 0, 0, 0); }
 
 int polySAR::DestroyPolys() {
-    return each_list([this](std::size_t, auto list, auto count) {
+    return each_list([this](std::size_t index, auto list, auto count) {
         (this->*list).reset();
         this->*count = 0;
+        quo::PolynomialLists::note(*this, index, nullptr, 0);  // the next list may stand at the same place
         return QUO_OK;
     });
 }

@@ -3,6 +3,7 @@
 #include <charconv>
 #include <chrono>
 #include <cmath>
+#include <cstdint>
 #include <cstdio>
 #include <cstring>
 
@@ -28,7 +29,8 @@ std::optional<int> digits(std::string_view& text, std::size_t count, char behind
 /** A fraction from its point on; -1 for another text. */
 double fraction_of(std::string_view text) {
     double value = 0.0;
-    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
+    const auto [end, error] =
+        std::from_chars(text.data(), text.data() + text.size(), value, std::chars_format::fixed);
     return error == std::errc{} && end == text.data() + text.size() ? value : -1.0;
 }
 

@@ -146,6 +146,7 @@ const FftKernels* fft_kernels(int lanes) noexcept {
 }
 
 bool is_own_fft_length(int length) noexcept {
+    if (length < 1) return false;
     for (const int prime : {2, 3, 5, 7})
         while (length % prime == 0) length /= prime;
     return length == 1;
@@ -281,6 +282,12 @@ void FftTables::turn_lanes(RowFft& row) {
     for (int b = 0; b < packs; ++b)
         for (std::int64_t k = 0; k < first; ++k) of_packs.push_back(root(k * lane_of(b, lanes, second)));
     row.packs = keep(std::move(of_packs));
+}
+
+std::size_t FftTables::bytes() const noexcept {
+    std::size_t floats = room() + turns_.size();
+    for (const auto& roots : roots_) floats += roots.size() * (sizeof(FftRoot) / sizeof(float));
+    return floats * sizeof(float);
 }
 
 }  // namespace quo

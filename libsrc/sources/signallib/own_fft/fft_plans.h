@@ -41,6 +41,8 @@ public:
 
     /** Floats that a run works in. */
     [[nodiscard]] std::size_t room() const noexcept;
+    /** Bytes of the tables and of that room. */
+    [[nodiscard]] std::size_t bytes() const noexcept;
     /** Transforms `count` rows or columns; `pitch` floats lie between rows of the image. */
     void run(const float* in, float* out, std::ptrdiff_t pitch, int count, float* room) const noexcept;
 

@@ -31,6 +31,8 @@ public:
         return done;
     }
 
+    [[nodiscard]] std::size_t held_bytes() const noexcept override { return tables_->bytes(); }
+
 private:
     std::shared_ptr<const FftTables> tables_;
     std::ptrdiff_t pitch_;
@@ -58,10 +60,13 @@ public:
 private:
     /** Plans of one kind share their tables as long as there are any. */
     std::shared_ptr<const FftTables> tables_of(const FftKind& kind) {
+        std::shared_ptr<const FftTables> tables;
+        if (const std::lock_guard guard{guard_}; const auto known = tables_[kind].lock()) return known;
+        tables = std::make_shared<const FftTables>(kind);  // long ones take a while: nobody waits for them
         const std::lock_guard guard{guard_};
         std::weak_ptr<const FftTables>& known = tables_[kind];
-        std::shared_ptr<const FftTables> tables = known.lock();
-        if (!tables) known = tables = std::make_shared<const FftTables>(kind);
+        if (const auto other = known.lock()) return other;
+        known = tables;
         std::erase_if(tables_, [](const auto& entry) { return entry.second.expired(); });
         return tables;
     }
