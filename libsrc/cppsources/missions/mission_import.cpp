@@ -240,7 +240,7 @@ void require_apart(const quo_import_request& request, const Sentinel1Files& file
             std::error_code error;
             const bool renewed = request.link != 0 && out == raster && fs::is_symlink(out, error);
             if (!in.empty() && !renewed && fs::equivalent(in, out, error) && !error)
-                refuse(QUO_REFUSED, out + ": is, or is a link to, " + in + ", which is read");
+                refuse(QUO_REFUSED, std::string{out}.append(": is, or is a link to, ").append(in));
         }
     errno = 0;
 }

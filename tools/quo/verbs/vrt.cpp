@@ -44,9 +44,10 @@ struct Controls {
 };
 
 std::vector<double> even_places(int length, int count) {
-    std::vector<double> places;
-    for (int i = 0; i < std::min(length, count); ++i)
-        places.push_back((length - 1) * static_cast<double>(i) / std::max(1, std::min(length, count) - 1));
+    const int last = std::min(length, count) - 1;
+    std::vector<double> places(static_cast<std::size_t>(last) + 1);
+    for (int i = 0; i <= last; ++i)
+        places[static_cast<std::size_t>(i)] = (length - 1) * static_cast<double>(i) / std::max(1, last);
     return places;
 }
 

@@ -61,11 +61,11 @@ private:
     /** Plans of one kind share their tables as long as there are any. */
     std::shared_ptr<const FftTables> tables_of(const FftKind& kind) {
         std::shared_ptr<const FftTables> tables;
-        if (const std::lock_guard guard{guard_}; const auto known = tables_[kind].lock()) return known;
+        if (const std::lock_guard guard{guard_}; auto known = tables_[kind].lock()) return known;
         tables = std::make_shared<const FftTables>(kind);  // long ones take a while: nobody waits for them
         const std::lock_guard guard{guard_};
         std::weak_ptr<const FftTables>& known = tables_[kind];
-        if (const auto other = known.lock()) return other;
+        if (auto other = known.lock()) return other;
         known = tables;
         std::erase_if(tables_, [](const auto& entry) { return entry.second.expired(); });
         return tables;
