@@ -41,7 +41,7 @@ public:
         exit_ckerr();
         init_ckerr_locking();
         init_report(report_.c_str(), "threads", 1);
-        setenv("QUO_FFT_ENGINE", "fftw", 1);
+        setenv("QUO_FFT_ENGINE", "auto", 1);
         setenv("QUO_FFTW_MODULE", QUO_TEST_FFTW_MODULE, 1);
     }
     ~Threads() override {
@@ -133,9 +133,9 @@ void transform(Desk& desk) {
     desk.note(pfft_c(&plan, image.data(), image.data()));
     desk.note(fft_destp_c(&plan));
     desk.note(std::round(std::abs(image[77])));
-    std::vector<float> real(360);
+    std::vector<float> real(363);  // of a factor that another engine takes
     for (std::size_t i = 0; i < real.size(); ++i) real[i] = static_cast<float>(i % 7);
-    desk.note(fft_r(360, 360, 1, 1, 1, 0, real.data(), real.data()));
+    desk.note(fft_r(363, 363, 1, 1, 1, 0, real.data(), real.data()));
     desk.note(std::round(real[0]));
     desk.note(fft_c(1, 0, 1, 1, 1, 0, image.data(), image.data()));  // refused, which the thread alone is told
     desk.note(std::strlen(fft_engine_error()) == 0);
@@ -178,7 +178,7 @@ TEST_F(Threads, WorkingAtTheSameTimeFindWhatOneFindsAlone) {
     test::CapturedStderr captured;
     work(0);
     const std::vector<double> alone = desks[0].results;
-    EXPECT_STREQ(fft_engine_name(), "fftw");
+    EXPECT_STRNE(fft_engine_name(), "");
     side_by_side(work);
     for (const Desk& desk : desks) EXPECT_EQ(desk.results, alone);
     FreeProfile(nullptr);
