@@ -22,7 +22,7 @@ class GeneralSAR;
 class ImageGrid_Obj;
 
 /** The pixel grid of a product: the header's section "ImageGrid", else that of its region, where that has the size
- * of the raster or none is described.
+ * of the raster, or the header tells of no raster.
  * @param header   the file that the product was read from
  * @param product  what was read of it
  * @param grid     changed in any case
