@@ -67,13 +67,24 @@ void add_raster(Facts& facts, const RasterDescription& raster) {
                {"row_prefix", raster.RowPrefix}});
 }
 
-void add_sampling(Facts& facts, const SamplingConstants_Obj& sampling) {
-    add_number(facts, "PRF", "prf_hz", sampling.prf_hz, 1.0, "Hz");
-    add_number(facts, "sampling rate", "sampling_rate_hz", sampling.frg_hz, 1e-6, "MHz");
-    add_number(facts, "carrier", "carrier_hz", sampling.fc_hz, 1e-9, "GHz");
-    add_number(facts, "wavelength", "wavelength_m", sampling.lambda_m, 1.0, "m");
-    add_number(facts, "range bandwidth", "range_bandwidth_hz", sampling.Brg_hz, 1e-6, "MHz");
-    add_number(facts, "azimuth bandwidth", "azimuth_bandwidth_hz", sampling.Baz_hz, 1.0, "Hz");
+/** Sampling constants in their own units, people see them in `prefix` times those. */
+void add_sampling(Facts& facts, GeneralSAR& product) {
+    constexpr struct {
+        const char *name, *key, *field;
+        double scale;
+        const char* prefix;
+    } kShown[] = {{"PRF", "prf_hz", "prf_hz", 1.0, ""},
+                  {"sampling rate", "sampling_rate_hz", "frg_hz", 1e-6, "M"},
+                  {"carrier", "carrier_hz", "fc_hz", 1e-9, "G"},
+                  {"wavelength", "wavelength_m", "lambda_m", 1.0, ""},
+                  {"range bandwidth", "range_bandwidth_hz", "Brg_hz", 1e-6, "M"},
+                  {"azimuth bandwidth", "azimuth_bandwidth_hz", "Baz_hz", 1.0, ""}};
+    for (const auto& [name, key, field, scale, prefix] : kShown) {
+        const parElement& element =
+            *product.GSelement(gsSamplingConstants, std::string{"SamplingConstants/"} + field);
+        add_number(facts, name, key, *static_cast<const double*>(element.pointer), scale,
+                   (prefix + std::string{element.unit}).c_str());
+    }
 }
 
 void add_corners(Facts& facts, GeneralSAR& product) {
@@ -145,7 +156,7 @@ int show_info(const InfoOptions& options) {
     if (product.GSexists(gsRoi)) add_region(facts, product.roi.Roi);
     if (product.GSexists(gsOrbit)) add_orbit(facts, product.orbit);
     if (const RasterDescription* raster = described_raster(product)) add_raster(facts, *raster);
-    if (product.GSexists(gsSamplingConstants)) add_sampling(facts, product.samplingConstants);
+    if (product.GSexists(gsSamplingConstants)) add_sampling(facts, product);
     add_geometry(facts, options.header, product);
     add_corners(facts, product);
     add_objects(facts, product);

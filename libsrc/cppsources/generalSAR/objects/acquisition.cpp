@@ -26,16 +26,16 @@ namespace sampling {
 using Obj = SamplingConstants_Obj;
 constexpr quo::FieldTable kTable{
     "SamplingConstants",
-    QUO_FIELD(fc_hz, "CarrierFrequency", quo::above(0.0)),
-    QUO_FIELD(frg_hz, "SamplingRate", quo::above(0.0)),
-    QUO_FIELD(Brg_hz, "RangeBandWidth", quo::above(0.0)),
-    QUO_FIELD(Trg_s, "RangeTSamplingStep", quo::above(0.0)),
-    QUO_FIELD(prf_hz, "PRF", quo::above(0.0)),
-    QUO_FIELD(pri_s, "PRI", quo::above(0.0)),
-    QUO_FIELD(Baz_hz, "AzimuthBandwidth", quo::above(0.0)),
-    QUO_FIELD(brf_hz, "BRF", quo::at_least(0.0)),
-    QUO_FIELD(bri_s, "BRI", quo::at_least(0.0)),
-    QUO_FIELD(lambda_m, "WaveLength", quo::above(0.0)),
+    QUO_FIELD(fc_hz, "CarrierFrequency", quo::above(0.0), quo::unit("Hz")),
+    QUO_FIELD(frg_hz, "SamplingRate", quo::above(0.0), quo::unit("Hz")),
+    QUO_FIELD(Brg_hz, "RangeBandWidth", quo::above(0.0), quo::unit("Hz")),
+    QUO_FIELD(Trg_s, "RangeTSamplingStep", quo::above(0.0), quo::unit("s")),
+    QUO_FIELD(prf_hz, "PRF", quo::above(0.0), quo::unit("Hz")),
+    QUO_FIELD(pri_s, "PRI", quo::above(0.0), quo::unit("s")),
+    QUO_FIELD(Baz_hz, "AzimuthBandwidth", quo::above(0.0), quo::unit("Hz")),
+    QUO_FIELD(brf_hz, "BRF", quo::at_least(0.0), quo::unit("Hz")),
+    QUO_FIELD(bri_s, "BRI", quo::at_least(0.0), quo::unit("s")),
+    QUO_FIELD(lambda_m, "WaveLength", quo::above(0.0), quo::unit("m")),
 };
 }  // namespace sampling
 
@@ -43,11 +43,11 @@ namespace pulse {
 using Obj = SARPulse_Obj;
 constexpr quo::FieldTable kTable{
     "Pulse",
-    QUO_FIELD(PulseLength, quo::above(0.0)),
-    QUO_FIELD(Bandwidth, quo::above(0.0)),
-    QUO_FIELD(PulseKRate),
+    QUO_FIELD(PulseLength, quo::above(0.0), quo::unit("s")),
+    QUO_FIELD(Bandwidth, quo::above(0.0), quo::unit("Hz")),
+    QUO_FIELD(PulseKRate, quo::unit("Hz/s")),
     QUO_FIELD(PulseEnergy, quo::at_least(0.0)),
-    QUO_FIELD(PulseSamplingRate, quo::above(0.0)),
+    QUO_FIELD(PulseSamplingRate, quo::above(0.0), quo::unit("Hz")),
 };
 }  // namespace pulse
 
@@ -55,11 +55,11 @@ namespace attitude {
 using Obj = SensorAttitude_Obj;
 constexpr quo::FieldTable kTable{
     "SensorAttitude",
-    QUO_FIELD(Eq_speed, quo::at_least(0.0)),
-    QUO_FIELD(Eq_distance, quo::at_least(0.0)),
-    QUO_FIELD(Mean_DC),
-    QUO_FIELD(SquintAngle, quo::between(-90.0, 90.0)),
-    QUO_FIELD(AntennaLength, quo::above(0.0)),
+    QUO_FIELD(Eq_speed, quo::at_least(0.0), quo::unit("m/s")),
+    QUO_FIELD(Eq_distance, quo::at_least(0.0), quo::unit("m")),
+    QUO_FIELD(Mean_DC, quo::unit("Hz")),
+    QUO_FIELD(SquintAngle, quo::between(-90.0, 90.0), quo::unit("degrees")),
+    QUO_FIELD(AntennaLength, quo::above(0.0), quo::unit("m")),
     QUO_FIELD(DroopGain),
     QUO_FIELD(Temperature),
 };
@@ -77,8 +77,8 @@ constexpr quo::FieldTable kTable{
     QUO_FIELD(RgMatchedFilterType),
     QUO_FIELD(RgMatchedFilterCoef, quo::between(0.0, 1.0)),
     QUO_FIELD(AzMatchedFilterCoef, quo::between(0.0, 1.0)),
-    QUO_FIELD(RgLookBandwidth, quo::at_least(0.0)),
-    QUO_FIELD(AzLookBandwidth, quo::at_least(0.0)),
+    QUO_FIELD(RgLookBandwidth, quo::at_least(0.0), quo::unit("Hz")),
+    QUO_FIELD(AzLookBandwidth, quo::at_least(0.0), quo::unit("Hz")),
 };
 }  // namespace windows
 

@@ -16,7 +16,8 @@ constexpr const char* kProfileSection = "GeoGridSize";
 constexpr const char* kRoiSection = "ROI";
 
 using Obj = geoCoords_Obj;
-constexpr quo::FieldTable kTable{"GroundCornersPoints", QUO_FIELD(EastingGridSize), QUO_FIELD(NorthingGridSize)};
+constexpr quo::FieldTable kTable{"GroundCornersPoints", QUO_FIELD(EastingGridSize, quo::unit("m")),
+                                 QUO_FIELD(NorthingGridSize, quo::unit("m"))};
 
 struct NamedPoint {
     const char* name;
