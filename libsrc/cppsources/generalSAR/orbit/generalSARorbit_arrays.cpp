@@ -1,5 +1,4 @@
 #include <algorithm>
-#include <cerrno>
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
@@ -8,12 +7,13 @@
 #include <span>
 
 #include "diagnosticslib/call_frame.h"
+#include "diagnosticslib/errno_kept.h"
 #include "generalSAR/orbit/orbit_points.h"
 #include "quo_base/generalSARorbit.h"
 
 // Arrays go through blocks of their own: a block's inputs are all read before its outputs are written, so that an
-// output may take the place of an input. What is not refused opens no frame and enters nothing in the report, both
-// of which are the process's: calls may run side by side.
+// output may take the place of an input. What is not refused enters nothing in the report: a million points
+// without a solution would fill it.
 
 namespace {
 
@@ -30,18 +30,6 @@ int refuse(const char* call, const char* message, int line = __builtin_LINE()) n
     quo::CallFrame frame{call, kSource, line};
     return frame.fail(QUO_REFUSED, message, line);
 }
-
-/** Leaves errno as it was: where a speed does not allow a Doppler, the first guess draws the root of a negative
- * number. */
-class ErrnoKept {
-public:
-    ErrnoKept() noexcept = default;
-    ~ErrnoKept() { errno = before_; }
-    ErrnoKept(ErrnoKept&&) = delete;
-
-private:
-    int before_ = errno;
-};
 
 // --- The arrays of a call ---------------------------------------------------------------------------------------
 
@@ -211,7 +199,7 @@ int Obj::sat2earth(const OrbitSamples& samples, const OrbitGround& ground) const
     std::ranges::transform(kGroundArrays, outputs, [&](const GroundArray& a) { return ground.*a.array; });
     if (!lie_well(inputs, outputs, ground.status, samples.count)) return refuse(kForward, kBadArrays);
 
-    const ErrnoKept kept;
+    const quo::ErrnoKept kept;  // a first guess may draw the root of a negative number
     const quo::OrbitModel& model = *model_;
     const quo::OrbitView view = model.view(lambda_, static_cast<double>(look_sign_));
     const quo::ArrayKernels& kernels = quo::array_kernels();
@@ -243,7 +231,7 @@ int Obj::earth2sat(const OrbitTargets& targets, const OrbitSightings& seen) cons
     double* const outputs[] = {seen.azimuth_s, seen.range_s};
     if (!lie_well(inputs, outputs, seen.status, targets.count)) return refuse(kInverse, kBadArrays);
 
-    const ErrnoKept kept;
+    const quo::ErrnoKept kept;  // a first guess may draw the root of a negative number
     const quo::OrbitModel& model = *model_;
     const quo::OrbitView view = model.view(lambda_, static_cast<double>(look_sign_));
     const quo::ArrayKernels& kernels = quo::array_kernels();
