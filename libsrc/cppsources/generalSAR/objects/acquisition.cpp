@@ -9,10 +9,8 @@
 
 #include "diagnosticslib/call_frame.h"
 #include "generalSAR/objects/annex_file.h"
-#include "profilelib/profile_look.h"
 #include "quo_base/datafile.h"
 #include "quo_base/gen_utils.h"
-#include "quo_base/profile.h"
 #include "quorelxmllib/field_table.h"
 #include "roilib/rounding.h"
 #include "sarutillib/ground/bounded_text.h"
@@ -94,19 +92,6 @@ constexpr quo::FieldTable kTable{
     QUO_FIELD(QL_RangeML, quo::bounds(0, kMaxInt)),
 };
 }  // namespace quicklook
-
-namespace point {
-using Obj = geopoint;
-constexpr quo::FieldTable kTable{"GroundCornersPoints", QUO_FIELD(Point)};
-// The members that the values of Point belong to.
-constexpr double Obj::*kNamed[] = {&Obj::Latitude, &Obj::Longitude, &Obj::Height, &Obj::IncidenceAngle,
-                                   &Obj::LookAngle};
-constexpr const char* kProfileSection = "Coordinates";
-
-std::string section_of(const char* name) {
-    return std::string{kTable.section()} + "/" + std::string{quo::text_or_empty(name)};
-}
-}  // namespace point
 
 /** The numbers that a reference chirp follows from. */
 struct Chirp {
@@ -219,26 +204,4 @@ int QuickLook_Obj::writehdr(const char* file) { return writeAuxiliaryFile(file, 
 int QuickLook_Obj::readhdr(const char* file) {
     readAuxiliaryFile(file, 1, quicklook::kTable.section());
     return QUO_OK;  // a product without a quick-look is as good as one with
-}
-
-QUO_RECORD(geopoint, point::kTable)
-int geopoint::clone(geopoint* to) const {
-    for (const auto member : point::kNamed) to->*member = this->*member;
-    return point::kTable.copy(*this, *to);
-}
-int geopoint::writehdr(const char* file, const char* name) {
-    std::ranges::transform(point::kNamed, Point, [this](auto member) { return this->*member; });
-    return writeAuxiliaryFile(file, 1, point::section_of(name).c_str());
-}
-int geopoint::readhdr(const char* file, const char* name) {
-    // What Point holds becomes the named members even where neither form of the file has the point: the two never
-    // differ after a read.
-    if (!readAuxiliaryFile(file, 1, point::section_of(name).c_str())) {
-        if (const int unread = quo::Record::unread(*this)) return unread;
-        const quo::ProfileLook look{file};
-        GetProfileDoubleArray(point::kProfileSection, name, Point, static_cast<int>(std::size(Point)), file);
-    }
-    const double* value = Point;
-    for (const auto member : point::kNamed) this->*member = *value++;
-    return QUO_OK;
 }
