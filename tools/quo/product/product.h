@@ -39,8 +39,6 @@ std::vector<Corner> orbit_corners(GeneralSAR& product);
 /** The same from the corner grid alone. */
 std::vector<Corner> grid_corners(const GeneralSAR& product);
 
-/** The description of the raster that the header belongs to, in whichever form; null where there is none. */
-const RasterDescription* described_raster(const GeneralSAR& product);
 /** The name of the raster that a header belongs to: the header's name without ".hdr"; nothing for another name. */
 std::optional<std::string> raster_of(const std::string& header);
 

@@ -3,6 +3,7 @@
 #include "facts.h"
 #include "pixels.h"
 #include "product.h"
+#include "quo_base/derived_raster.h"
 #include "raster.h"
 
 namespace tool {

@@ -10,6 +10,7 @@
 #include "datafilelib/raster_region.h"
 #include "datafilelib/sample_kernels.h"
 #include "diagnosticslib/call_frame.h"
+#include "quo_base/derived_raster.h"
 #include "quo_base/generalSAR.h"
 #include "quorelxmllib/guarded.h"
 #include "sarutillib/ground/bounded_text.h"
@@ -46,15 +47,12 @@ int with_product(const quo::SharedCall& function, const quo_product* handle, Use
 
 // --- Opening ----------------------------------------------------------------------------------------------------
 
-/** Takes over the raster that the header describes, in its own section or, in the older form, beside it. */
+/** Takes over the raster that the header describes, if it does. */
 int take_described_raster(OpenProduct& product) {
-    DataFile& beside = product.header.dataFile.File;
-    if (!product.header.GSexists(gsBufferFile))
-        return beside.NrOfLinesPerImage != 0 && beside.NrOfPixelsPerLine != 0 ? product.raster.clone(&beside) : 0;
-    char name[sizeof product.raster.FileName];
-    product.header.bufferFile.getFilename(name);
-    product.raster.copyDescription(product.header.bufferFile);
-    return product.raster.setFilename(name);
+    const RasterDescription* const described = described_raster(product.header);
+    if (!described) return QUO_OK;
+    product.raster.copyDescription(*described);
+    return product.raster.setFilename(product.header.dataFile.File.FileName);  // of the header's name, in any form
 }
 
 bool has_raster(const OpenProduct& product) { return product.raster.FileName[0] != '\0'; }
