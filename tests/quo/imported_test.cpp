@@ -1,6 +1,11 @@
-// What the tool makes of products of a mission.
+// What the tool makes of products of a mission, and of one with the lines of a map in it.
 #include <gtest/gtest.h>
 
+#include <cmath>
+#include <complex>
+#include <cstdlib>
+#include <functional>
+#include <nlohmann/json.hpp>
 #include <string>
 #include <vector>
 
@@ -9,6 +14,8 @@
 #include "tool.h"
 
 namespace {
+
+using nlohmann::json;
 
 struct Mission {
     const char *name, *safe, *wide;
@@ -67,6 +74,104 @@ TEST_P(Imported, IsRightUntilHeaderAndRasterPart) {
     }
 }
 
+// ---- Items of a catalogue
+
+bool is_time(const json& value) {
+    const std::string text = value.is_string() ? value.get<std::string>() : "";
+    return text.size() > 20 && text[4] == '-' && text[10] == 'T' && text.ends_with('Z');
+}
+bool above_zero(const json& value) { return value.is_number() && value.get<double>() > 0.0; }
+bool is_count(const json& value) { return value.is_number_integer() && value.get<int>() > 0; }
+bool is_angle(const json& value) { return value.is_number() && value >= 0.0 && value <= 90.0; }
+bool is_name(const json& value) { return value.is_string() && !value.get<std::string>().empty(); }
+auto one_of(const json& values) {
+    return [values](const json& value) { return std::ranges::find(values, value) != values.end(); };
+}
+auto equals(const json& expected) {
+    return [expected](const json& value) { return value == expected; };
+}
+auto list_of(const std::function<bool(const json&)>& fits, std::size_t least, std::size_t most) {
+    return [=](const json& value) {
+        return value.is_array() && value.size() >= least && value.size() <= most &&
+               std::ranges::all_of(value, fits);
+    };
+}
+bool is_number(const json& value) { return value.is_number(); }
+
+// What the published schemas of the item and its four extensions require, and the types and words of what they
+// leave free.
+TEST_P(Imported, MakesAnItemThatItsSchemasAllow) {
+    const bool grd = GetParam().safe == test::kGrd;
+    const std::string url = "https://stac-extensions.github.io/";
+    const struct {
+        const char* path;
+        std::function<bool(const json&)> fits;
+    } kRules[] = {
+        {"/stac_version", equals("1.0.0")},
+        {"/type", equals("Feature")},
+        {"/id", is_name},
+        {"/stac_extensions", equals({url + "sar/v1.0.0/schema.json", url + "sat/v1.0.0/schema.json",
+                                     url + "projection/v1.1.0/schema.json", url + "view/v1.0.0/schema.json"})},
+        {"/geometry/type", equals("Polygon")},
+        {"/geometry/coordinates/0", list_of(list_of(is_number, 2, 2), 5, 5)},
+        {"/bbox", list_of(is_number, 4, 4)},
+        {"/links", list_of([](const json&) { return true; }, 0, 0)},
+        {"/assets/header/href", equals("./scene.hdr")},
+        {"/assets/raster/href", equals("./scene")},
+        {"/assets/raster/roles", equals({"data"})},
+        {"/properties/datetime", is_time},
+        {"/properties/start_datetime", is_time},
+        {"/properties/end_datetime", is_time},
+        {"/properties/platform", equals(grd ? "sentinel-1b" : "sentinel-1a")},
+        {"/properties/sar:instrument_mode", equals("IW")},
+        {"/properties/sar:frequency_band", equals("C")},
+        {"/properties/sar:center_frequency", [](const json& f) { return f > 5.4 && f < 5.41; }},
+        {"/properties/sar:polarizations", list_of(one_of({"HH", "VV", "HV", "VH"}), 1, 1)},
+        {"/properties/sar:product_type", equals(grd ? "GRD" : "SLC")},
+        {"/properties/sar:observation_direction", equals("right")},
+        {"/properties/sar:looks_range", is_count},
+        {"/properties/sar:pixel_spacing_range", above_zero},
+        {"/properties/sar:pixel_spacing_azimuth", above_zero},
+        {"/properties/sat:orbit_state", equals(grd ? "descending" : "ascending")},
+        {"/properties/sat:absolute_orbit", equals(grd ? 30148 : 41314)},
+        {"/properties/sat:relative_orbit", is_count},
+        {"/properties/view:incidence_angle", is_angle},
+        {"/properties/view:off_nadir", is_angle},
+        {"/properties/proj:epsg", equals(nullptr)},
+        {"/properties/proj:shape", equals({GetParam().lines, 30})},
+        {"/properties/proj:centroid/lat", is_number},
+        {"/properties/proj:centroid/lon", is_number},
+    };
+    const auto made = test::quo({"stac", raster()});
+    ASSERT_EQ(made.exit_status, 0) << made.err;
+    const json item = json::parse(made.out);
+    for (const auto& [path, fits] : kRules) {
+        const json::json_pointer place{path};
+        ASSERT_TRUE(item.contains(place)) << path;
+        EXPECT_TRUE(fits(item[place])) << path << ": " << item[place];
+    }
+    const auto& centre = item["properties"]["proj:centroid"];
+    const auto& box = item["bbox"];
+    EXPECT_TRUE(box[0] < centre["lon"] && centre["lon"] < box[2]) << box;
+    EXPECT_TRUE(box[1] < centre["lat"] && centre["lat"] < box[3]) << box;
+
+    constexpr struct {
+        const char *field, *value, *missing;
+    } kUntold[] = {{"DataSetInfo/ImageType", "NOT SET", "no image type"},
+                   {"DataSetInfo/Polarization", "NOT_AVAILABLE", "no polarization"},
+                   {"SamplingConstants/fc_hz", "7e8", "no frequency of a radar band"}};
+    for (const auto& [field, value, missing] : kUntold) {
+        const std::string before = test::read_text(header());
+        const std::string name = std::string{field}.substr(std::string{field}.find('/') + 1);
+        const auto from = before.find("<" + name + ">") + name.size() + 2;
+        test::write_text(header(), std::string{before}.replace(from, before.find('<', from) - from, value));
+        const auto refused = test::quo({"stac", raster()});
+        EXPECT_EQ(refused.exit_status, 1) << field;
+        EXPECT_EQ(refused.out, "");
+        EXPECT_NE(refused.err.find(missing), std::string::npos) << refused.err;
+        test::write_text(header(), before);
+    }
+}
 INSTANTIATE_TEST_SUITE_P(Sentinel1, Imported, testing::ValuesIn(kMissions),
                          [](const auto& test) { return std::string{test.param.name}; });
 

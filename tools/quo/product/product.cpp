@@ -61,6 +61,11 @@ std::vector<Corner> grid_corners(const GeneralSAR& product) {
     return corners;
 }
 
+bool is_told(std::string_view text) {
+    return !text.empty() && text != "NOT_AVAILABLE" && text != "NOT SET" && text != "SENSOR UNKNOWN" &&
+           !text.ends_with(" UNDEFINED");
+}
+
 void read_region(const std::string& header, ROI_Obj& region) {
     const bool found = region.read_roi(header.c_str(), "ROI") == QUO_OK && region.isNULL() == 0;
     const double sum = region.FastStartTime + region.FastTimeLength + region.SlowStartTime + region.SlowTimeLength;

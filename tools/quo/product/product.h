@@ -22,6 +22,9 @@ const parElement* element_at(GeneralSAR& product, std::string_view field);
 /** Whether a field is known to hold numbers. */
 bool is_numeric_field(GeneralSAR& product, std::string_view field);
 
+/** Whether a text of the description tells something: it is none of the marks of a missing one. */
+bool is_told(std::string_view text);
+
 /** Reads a header's section ROI. Throws Failure where it is not there or holds no sample. */
 void read_region(const std::string& header, ROI_Obj& region);
 

@@ -142,8 +142,7 @@ std::string metadata(GeneralSAR& product) {
     const DataSetInfo_Obj& info = product.dataSetInfo;
     std::string text;
     const auto add = [&](const char* key, const std::string& value) {
-        if (!value.empty() && value != "NOT_AVAILABLE" && !value.ends_with("UNDEFINED") &&
-            value != "SENSOR UNKNOWN" && value != "NOT SET")
+        if (is_told(value))
             text += "    <MDI key=\"" + std::string{key} + "\">" + quo::quoted_xml(value) + "</MDI>\n";
     };
     if (product.GSexists(gsDataSetInfo)) {
@@ -175,7 +174,7 @@ Described describe(const std::string& header) {
     if (Pixels::known(header, product))
         described.before_band = control_points({header, product}) + described.before_band;
     const std::string polarization = product.dataSetInfo.Polarization;
-    if (product.GSexists(gsDataSetInfo) && polarization != "NOT_AVAILABLE")
+    if (product.GSexists(gsDataSetInfo) && is_told(polarization))
         described.band_name = element("Description", quo::quoted_xml(polarization));
     return described;
 }
