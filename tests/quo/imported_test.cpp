@@ -175,4 +175,72 @@ TEST_P(Imported, MakesAnItemThatItsSchemasAllow) {
 INSTANTIATE_TEST_SUITE_P(Sentinel1, Imported, testing::ValuesIn(kMissions),
                          [](const auto& test) { return std::string{test.param.name}; });
 
+// ---- On the map
+
+/** A raster that lies on the map: north up, squares of `step_deg`. */
+struct MapImage {
+    static constexpr double kWest_deg = 11.372, kNorth_deg = 41.812, kStep_deg = 0.00004;
+    static constexpr int kColumns = 800, kRows = 1175;  // to 11.404 east and 41.765 north, all of it in the image
+    std::vector<std::complex<float>> samples = std::vector<std::complex<float>>(kColumns * kRows);
+
+    [[nodiscard]] bool bright(double longitude_deg, double latitude_deg) const {
+        const auto column = static_cast<int>((longitude_deg - kWest_deg) / kStep_deg);
+        const auto row = static_cast<int>((kNorth_deg - latitude_deg) / kStep_deg);
+        return std::abs(samples[static_cast<std::size_t>(row * kColumns + column)]) > 1000.0F;
+    }
+};
+
+/** How far the middle of what is bright lies off 0, over 0.002 degrees to either side and all of `along`. */
+double offset(const std::function<bool(double along_deg, double across_deg)>& bright) {
+    double sum = 0.0;
+    int count = 0;
+    for (double along_deg = 0.00202; along_deg < 0.008; along_deg += MapImage::kStep_deg)
+        for (double across_deg = -0.00198; across_deg < 0.002; across_deg += MapImage::kStep_deg)  // centres
+            if (bright(along_deg, across_deg)) {
+                sum += across_deg;
+                ++count;
+            }
+    EXPECT_GT(count, 500);
+    return sum / count;
+}
+
+// The example's image is bright where the map has a line every 0.01 degrees; GDAL knows of the image's geometry
+// what the control points tell it. Their corner for their centre would be half a pixel off.
+TEST(Vrt, PutsTheLinesOfTheMapInTheirPlaces) {
+    if (std::system("gdalwarp --version > /dev/null 2>&1") != 0) GTEST_SKIP() << "GDAL is not installed";
+    const test::TemporaryFolder folder;
+    const std::string raster = folder.file("map.slc"), out = folder.file("map.bin");
+    ASSERT_EQ(test::Child(QUO_COMPLETE_PRODUCT, {test::scene_file("s1a_iw1_slc_20220104_asc.xml"), raster})
+                  .wait()
+                  .exit_status,
+              0);
+    ASSERT_EQ(test::quo({"vrt", raster}).exit_status, 0);
+    const std::string warp = "gdalwarp -q -tps -t_srs EPSG:4326 -te 11.372 41.765 11.404 41.812 -tr 4e-5 4e-5 " +
+                             std::string{"-ot CFloat32 -of ENVI '"} + raster + ".vrt' '" + out + "' 2>&1";
+    ASSERT_EQ(std::system(warp.c_str()), 0);
+    MapImage map;
+    const std::string bytes = test::read_text(out);
+    ASSERT_EQ(bytes.size(), map.samples.size() * sizeof map.samples[0]);
+    std::memcpy(map.samples.data(), bytes.data(), bytes.size());
+
+    constexpr double kLine_deg = 1.26e-4, kSample_deg = 5.0e-5;  // 14.0 m to the north, 4.2 m to the east
+    constexpr double kTolerated = 0.4;                           // pixels
+    for (const double latitude_deg : {41.77, 41.78, 41.79, 41.80})
+        for (const double longitude_deg : {11.38, 11.39}) {
+            const double to_north_deg = offset([&](double along_deg, double across_deg) {
+                return map.bright(longitude_deg + along_deg, latitude_deg + across_deg);
+            });
+            const double to_east_deg = offset([&](double along_deg, double across_deg) {
+                return map.bright(longitude_deg + across_deg, latitude_deg + along_deg);
+            });
+            EXPECT_LT(std::abs(to_north_deg), kTolerated * kLine_deg) << latitude_deg << " " << longitude_deg;
+            EXPECT_LT(std::abs(to_east_deg), kTolerated * kSample_deg) << latitude_deg << " " << longitude_deg;
+        }
+
+    const auto told = test::Child("/bin/sh", {"-c", "gdalinfo '" + raster + ".vrt'"}).wait();
+    for (const char* line : {"ID[\"EPSG\",4979]", "MISSION_ID=SENTINEL-1A", "ORBIT_DIRECTION=ASCENDING",
+                             "ACQUISITION_START_TIME=2022-01-04T17:06:10.601927", "Description = V/V"})
+        EXPECT_NE(told.out.find(line), std::string::npos) << line;
+}
+
 }  // namespace
