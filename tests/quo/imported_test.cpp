@@ -74,6 +74,24 @@ TEST_P(Imported, IsRightUntilHeaderAndRasterPart) {
     }
 }
 
+// The ground makes a jump from burst to burst, and where the conversion to ground range changes: control points on
+// both sides of it keep what is between them to half a pixel, over the whole width, and are as few as GDAL can
+// work with.
+TEST_P(Imported, HasControlPointsThatKeepHalfAPixel) {
+    const std::uint32_t samples = GetParam().safe == test::kSlc ? 22694 : 26102;
+    test::write_text(header(), test::replaced(test::read_text(header()), "<NrOfPixelsPerLine>30<",
+                                              "<NrOfPixelsPerLine>" + std::to_string(samples) + "<"));
+    std::filesystem::resize_file(raster(),
+                                 std::uintmax_t{samples} * GetParam().lines * 4);  // a hole, for the most
+    ASSERT_EQ(test::quo({"vrt", raster()}).exit_status, 0);
+    const std::string vrt = test::read_text(raster() + ".vrt");
+    const double most = std::stod(std::string{test::between(vrt, "between them up to ", " pixels off")});
+    EXPECT_GT(most, 0.0);
+    EXPECT_LE(most, 0.5);
+    const auto last = vrt.rfind("<GCP Id=\"");
+    EXPECT_LT(std::stoi(vrt.substr(last + 9)), 1000);
+}
+
 // ---- Items of a catalogue
 
 bool is_time(const json& value) {
