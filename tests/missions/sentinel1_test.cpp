@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstring>
 #include <filesystem>
 #include <string>
 #include <vector>
@@ -19,6 +20,7 @@
 namespace {
 
 namespace fs = std::filesystem;
+using test::kDetected;
 using test::kGrd;
 using test::kPlain;
 using test::kSlc;
@@ -116,6 +118,77 @@ INSTANTIATE_TEST_SUITE_P(Real, Sentinel1Products,
                          testing::Values(Truth{kSlc, false, 15, 0.001, 0.001, 0.05},
                                          Truth{kGrd, true, 20, 0.001, 0.012, 0.15}),
                          [](const auto& test) { return std::string{test.param.grd ? "Grd" : "Slc"}; });
+
+// --- Modes ------------------------------------------------------------------------------------------------------
+
+struct Mode {
+    const char *name, *safe, *mode, *swath, *file;
+    bool bursts;
+    const char* acquisition;
+    int order;
+};
+class Modes : public testing::TestWithParam<Mode> {};
+
+// The real annotations, brought to what other modes have: no bursts and an annotation for every vignette or beam,
+// or five swaths. The lines of bursts lie 1342 apart, so that an image of their time without bursts has them
+// there.
+TEST_P(Modes, AreTakenOverByWhatTheAnnotationHas) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    const Mode mode = GetParam();
+    const bool grd = mode.safe == kGrd;
+    Safe safe{folder, mode.safe};
+    safe.change("<mode>IW<", "<mode>" + std::string{mode.mode} + "<");
+    safe.change("<swath>IW", "<swath>" + std::string{mode.swath});
+    safe.rename("iw", mode.file);
+    safe.change(grd ? "<numberOfSamples>26102<" : "<numberOfSamples>22694<", "<numberOfSamples>30<");
+    if (!grd && !mode.bursts) {
+        const std::string text = test::read_text(safe.annotation());
+        const auto bursts = text.find("<burstList"), rest = text.find("</burstList>");
+        test::write_text(safe.annotation(), text.substr(0, bursts) + "<burstList count=\"0\"/>" +
+                                                text.substr(rest + std::strlen("</burstList>")));
+        safe.change("<linesPerBurst>1501<", "<linesPerBurst>0<");
+        safe.change("<numberOfLines>4503<", "<numberOfLines>4185<");
+        safe.change("<line>1501<", "<line>1342<");
+        safe.change("<line>3002<", "<line>2684<");
+    }
+    if (grd) {
+        const std::string text = test::read_text(safe.annotation());
+        const auto first = text.find("<swathProcParams>"), next = text.find("<swathProcParams>", first + 1);
+        safe.change("</swathProcParamsList>", text.substr(first, next - first) + text.substr(first, next - first) +
+                                                  "</swathProcParamsList>");
+    }
+    const std::uint32_t lines = grd ? 16705 : mode.bursts ? 4503 : 4185;
+    write_tiff(safe.measurement(), grd ? kDetected : kPlain, lines, 30, true);
+    quo_import_result result{};
+    ASSERT_EQ(import_safe(safe.path(), folder.file("scene"), result), 0) << result.message;
+    EXPECT_EQ(result.ties.count, grd ? 20 : 15);
+    EXPECT_LT(result.ties.most_line, 0.001);
+    EXPECT_LT(result.ties.most_ground_m, 0.15);
+
+    GeneralSAR product;
+    ASSERT_EQ(product.GSread((folder.file("scene") + ".hdr").c_str()), 0);
+    EXPECT_STREQ(product.dataSetInfo.AcquisitionMode, mode.acquisition);
+    EXPECT_EQ(product.swathInfo.Bursts, mode.bursts ? 3 : 0);
+    EXPECT_EQ(product.swathInfo.Order, mode.order);
+    EXPECT_EQ(product.roi.Roi.Lines, grd ? 16705 : 4185);
+    EXPECT_EQ(product.dataSetInfo.RangeBandwidth[4] > 0.0, grd);
+
+    // A second annotation like it, such as the next vignette's, can only be told by its name.
+    fs::copy(safe.annotation(), test::replaced(safe.annotation().string(), "00", "09"));
+    EXPECT_EQ(import_safe(safe.path(), folder.file("scene"), result), 1);
+    EXPECT_NE(std::string{result.message}.find("2 annotations of this swath and polarization; name one of them"),
+              std::string::npos)
+        << result.message;
+    EXPECT_EQ(import_safe(safe.annotation().string(), folder.file("scene"), result), 0) << result.message;
+}
+INSTANTIATE_TEST_SUITE_P(Sentinel1, Modes,
+                         testing::Values(Mode{"Stripmap", kSlc, "SM", "S", "s", false, "STRIPMAP", 1},
+                                         Mode{"Vignette", kSlc, "WV", "WV", "wv", false, "STRIPMAP", 1},
+                                         Mode{"ExtraWide", kSlc, "EW", "EW", "ew", true, "SCANSAR", 1},
+                                         Mode{"ExtraWideDetected", kGrd, "EW", "EW", "ew", false, "SCANSAR",
+                                              -999}),
+                         [](const auto& test) { return std::string{test.param.name}; });
 
 // --- Fields -----------------------------------------------------------------------------------------------------
 
@@ -263,7 +336,7 @@ TEST_P(Cuts, KeepTheTimesOfTheirPixels) {
         safe.change("<linesPerBurst>1501<", "<linesPerBurst>4<");  // bursts of four lines, seconds apart
     }
     Layout layout = kPlain;
-    if (grd) layout = {"", 16, SAMPLEFORMAT_UINT, COMPRESSION_NONE, false, false, 1};
+    if (grd) layout = kDetected;
     write_tiff(safe.measurement(), layout, static_cast<std::uint32_t>(cut.lines),
                static_cast<std::uint32_t>(cut.samples), true);
     quo_import_result result{};

@@ -23,11 +23,7 @@ struct Mission {
     test::Layout layout;
 };
 const Mission kMissions[] = {{"Slc", test::kSlc, "<numberOfSamples>22694<", 4503, test::kPlain},
-                             {"Grd",
-                              test::kGrd,
-                              "<numberOfSamples>26102<",
-                              16705,
-                              {"", 16, SAMPLEFORMAT_UINT, COMPRESSION_NONE, false, false, 16705}}};
+                             {"Grd", test::kGrd, "<numberOfSamples>26102<", 16705, test::kDetected}};
 
 /** A product that the tool imported: all lines, of which 30 samples. */
 class Imported : public testing::TestWithParam<Mission> {

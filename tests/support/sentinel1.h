@@ -29,6 +29,7 @@ struct Layout {
     std::uint32_t rows;  // of a strip
 };
 inline constexpr Layout kPlain{"Plain", 32, SAMPLEFORMAT_COMPLEXINT, COMPRESSION_NONE, false, false, 1};
+inline constexpr Layout kDetected{"Detected", 16, SAMPLEFORMAT_UINT, COMPRESSION_NONE, false, false, 1000};
 
 /** Part `part` of a made sample. */
 inline std::int16_t part_of(std::uint32_t line, std::uint32_t sample, std::uint32_t part) {
@@ -103,6 +104,12 @@ public:
         const std::string text = test::read_text(annotation_), changed = replaced(text, from, to);
         EXPECT_NE(text, changed) << from;
         test::write_text(annotation_, changed);
+    }
+    /** Renames the annotation, and so the measurement. */
+    void rename(const std::string& from, const std::string& to) {
+        const auto old = annotation_;
+        annotation_.replace_filename(replaced(old.filename().string(), from, to));
+        std::filesystem::rename(old, annotation_);
     }
     void change_element(const std::string& name, const std::string& content) {
         std::string text = test::read_text(annotation_);
