@@ -41,8 +41,8 @@ std::string band_of(double frequency_ghz) {
 
 /** "IW" of the swath "IW1", where swaths are named after their mode, else the mode as the header has it. */
 std::string mode_of(const DataSetInfo_Obj& info) {
-    const std::string swath = info.Swath, letters = swath.substr(0, swath.find_first_of("0123456789"));
-    if (is_told(swath) && letters.size() == 2) return letters;
+    const std::string_view swath = info.Swath, letters = swath.substr(0, swath.find_first_of("0123456789"));
+    if (letters.size() == 2) return std::string{letters};
     return is_told(info.AcquisitionMode) ? info.AcquisitionMode : "";
 }
 

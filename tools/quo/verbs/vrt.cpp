@@ -54,9 +54,8 @@ struct Places {
     }
 };
 
-/** The lines at which the ground makes a jump: where bursts begin, and of ground range where the polynomial
- * changes.
- */
+/** The lines at which the ground makes a jump, in their order: where bursts begin, and of ground range where the
+ * polynomial changes. */
 std::vector<double> jumps(const Pixels& pixels) {
     const ImageGrid_Obj& grid = pixels.grid();
     std::vector<double> lines;
@@ -92,8 +91,7 @@ public:
     }
     [[nodiscard]] const std::vector<Control>& points() const { return points_; }
 
-    /** The largest distances, in pixels, between what lies halfway between neighbours and where that is in truth.
-     */
+    /** The largest distances, in pixels, of what lies halfway between neighbours from its true place. */
     struct Error {
         double along_lines = 0.0, along_samples = 0.0, diagonal = 0.0;
         [[nodiscard]] double worst() const { return std::max({along_lines, along_samples, diagonal}); }
@@ -102,7 +100,7 @@ public:
         Error error;
         for (std::size_t i = 0; i + 1 < lines_.size(); ++i)
             for (std::size_t j = 0; j + 1 < samples_.size(); ++j) {
-                if (std::ranges::find(jumps_, lines_[i + 1]) != jumps_.end()) continue;
+                if (std::ranges::binary_search(jumps_, lines_[i + 1])) continue;
                 const Control* const a = &points_[i * samples_.size() + j];
                 const Control &b = a[1], &c = a[samples_.size()], &d = a[samples_.size() + 1];
                 const double pixel =
