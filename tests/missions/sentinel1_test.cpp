@@ -119,6 +119,18 @@ INSTANTIATE_TEST_SUITE_P(Real, Sentinel1Products,
                                          Truth{kGrd, true, 20, 0.001, 0.012, 0.15}),
                          [](const auto& test) { return std::string{test.param.grd ? "Grd" : "Slc"}; });
 
+// The line after the last one is a place for tie points, too, and in no burst: one of them used to cost the others.
+TEST(Sentinel1, DoesWithoutTiePointsInNoBurst) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    Safe safe{folder, kSlc};
+    safe.change("<line>3002<", "<line>4503<");
+    const auto made = std::make_unique<quo::Sentinel1Product>();
+    quo::describe_sentinel1({safe.annotation().string(), "", ""}, "", *made);
+    EXPECT_EQ(made->ties.count, 10);
+    EXPECT_LT(made->ties.most_line, 0.001);
+}
+
 // --- Modes ------------------------------------------------------------------------------------------------------
 
 struct Mode {

@@ -436,11 +436,15 @@ void find_delay(const TiePoints& ties, ImageGrid_Obj& grid) {
         return;
     constexpr double kShare = 0.5;
     double sum_s = 0.0;
-    for (std::size_t i = 0; i < ties.count(); ++i)
+    int count = 0;
+    for (std::size_t i = 0; i < ties.count(); ++i) {
+        if (std::isnan(line_s[i])) continue;  // in no burst
         sum_s += ties.range_s[i] - (ties.azimuth_s[i] - line_s[i]) / kShare;
-    if (!std::isfinite(sum_s)) return;
+        ++count;
+    }
+    if (count == 0 || !std::isfinite(sum_s)) return;
     grid.DelayShare = kShare;
-    grid.DelayReference_s = sum_s / static_cast<double>(ties.count());
+    grid.DelayReference_s = sum_s / count;
 }
 
 /** Root mean square and largest of some differences. */
