@@ -119,7 +119,8 @@ INSTANTIATE_TEST_SUITE_P(Real, Sentinel1Products,
                                          Truth{kGrd, true, 20, 0.001, 0.012, 0.15}),
                          [](const auto& test) { return std::string{test.param.grd ? "Grd" : "Slc"}; });
 
-// The line after the last one is a place for tie points, too, and in no burst: one of them used to cost the others.
+// The line after the last one is a place for tie points, too, and in no burst: one of them used to cost the
+// others.
 TEST(Sentinel1, DoesWithoutTiePointsInNoBurst) {
     const test::Report report;
     const test::TemporaryFolder folder;
