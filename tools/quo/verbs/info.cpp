@@ -3,14 +3,14 @@
 #include "facts.h"
 #include "pixels.h"
 #include "product.h"
+#include "quo_base/derived_raster.h"
 #include "raster.h"
 
 namespace tool {
 namespace {
 
-/** A text that is not the mark of a missing one. */
-void add_known(Facts& facts, const char* name, const char* key, std::string_view text, std::string_view unknown) {
-    if (!text.empty() && text != unknown && text != "NOT_AVAILABLE") facts.add_text(name, key, std::string{text});
+void add_known(Facts& facts, const char* name, const char* key, std::string_view text) {
+    if (is_told(text)) facts.add_text(name, key, std::string{text});
 }
 /** A number that is not the mark of a missing one; people see `scale` times it in `unit`. */
 void add_number(Facts& facts, const char* name, const char* key, double value, double scale, const char* unit) {
@@ -23,15 +23,15 @@ void add_time(Facts& facts, const char* name, const char* key, double seconds) {
 }
 
 void add_data_set(Facts& facts, const DataSetInfo_Obj& info) {
-    add_known(facts, "mission", "mission", info.SensorName, "SENSOR UNKNOWN");
-    add_known(facts, "mode", "mode", info.AcquisitionMode, "ACQUISITION MODE UNDEFINED");
-    add_known(facts, "polarization", "polarization", info.Polarization, "");
-    add_known(facts, "swath", "swath", info.Swath, "");
-    add_known(facts, "orbit number", "orbit_number", info.OrbitNumber, "");
-    add_known(facts, "scene", "scene", info.SceneID, "");
-    add_known(facts, "description", "description", info.Description, "");
-    add_known(facts, "image type", "image_type", info.ImageType, "NOT SET");
-    add_known(facts, "projection", "projection", info.Projection, "PROJECTION UNDEFINED");
+    add_known(facts, "mission", "mission", info.SensorName);
+    add_known(facts, "mode", "mode", info.AcquisitionMode);
+    add_known(facts, "polarization", "polarization", info.Polarization);
+    add_known(facts, "swath", "swath", info.Swath);
+    add_known(facts, "orbit number", "orbit_number", info.OrbitNumber);
+    add_known(facts, "scene", "scene", info.SceneID);
+    add_known(facts, "description", "description", info.Description);
+    add_known(facts, "image type", "image_type", info.ImageType);
+    add_known(facts, "projection", "projection", info.Projection);
     facts.add_text("look side", "look_side", info.LookDirection < 0 ? "left" : "right");
 }
 

@@ -174,6 +174,21 @@ int Obj::setRegion(const ROI_Obj& region) {
     return frame.success();
 }
 
+int Obj::getRegion(ROI_Obj* region, std::int32_t lines, std::int32_t samples) const {
+    if (!region || lines < 1 || samples < 1 || !isComplete()) return QUO_REFUSED;
+    const Axes axes{*this};
+    const auto first_s = axes.line_time(0.0), last_s = axes.line_time(lines - 1.0);
+    if (!first_s || !last_s) return QUO_REFUSED;
+    const double near_s = axes.range_time(0.0, *first_s), far_s = axes.range_time(samples - 1.0, *first_s);
+    const double covered = Bursts == 0 ? lines : std::round((*last_s - *first_s) / LineStep_s) + 1.0;
+    const bool possible = covered >= 1.0 && covered <= std::numeric_limits<std::int32_t>::max();
+    if (!possible || !std::isfinite(near_s + far_s)) return QUO_REFUSED;
+    region->SetSlowAxe(Epoch_s + *first_s, LineStep_s, static_cast<int>(covered));
+    region->SetFastAxe(near_s, GroundLists == 0 ? SampleStep_s : (far_s - near_s) / std::max(1, samples - 1),
+                       samples);
+    return QUO_OK;
+}
+
 int Obj::cut(double line, double sample, double line_step, double sample_step) {
     quo::CallFrame frame{"ImageGrid_Obj::cut", kSource};
     const bool steps =

@@ -10,6 +10,7 @@
 #include "diagnosticslib/errno_kept.h"
 #include "generalSAR/orbit/orbit_points.h"
 #include "quo_base/generalSARorbit.h"
+#include "sarutillib/ground/array_extents.h"
 
 // Arrays go through blocks of their own: a block's inputs are all read before its outputs are written, so that an
 // output may take the place of an input. What is not refused enters nothing in the report: a million points
@@ -33,42 +34,7 @@ int refuse(const char* call, const char* message, int line = __builtin_LINE()) n
 
 // --- The arrays of a call ---------------------------------------------------------------------------------------
 
-/** Where an array lies; nowhere for one that is not given. */
-struct Extent {
-    std::uintptr_t first = 0, bytes = 0;
-
-    Extent(const void* data, std::size_t element, std::size_t count) noexcept
-        : first{reinterpret_cast<std::uintptr_t>(data)}, bytes{data ? element * count : 0} {}
-    [[nodiscard]] bool fits() const noexcept { return first <= UINTPTR_MAX - bytes; }
-    [[nodiscard]] bool overlaps(const Extent& other) const noexcept {
-        return bytes > 0 && other.bytes > 0 && first < other.first + other.bytes && other.first < first + bytes;
-    }
-    [[nodiscard]] bool same(const Extent& other) const noexcept {
-        return first == other.first && bytes == other.bytes;
-    }
-};
-
-bool lie_well(std::span<const double* const> inputs, std::span<double* const> outputs, const std::int32_t* status,
-              std::size_t count) noexcept {
-    if (count > PTRDIFF_MAX / sizeof(double)) return false;
-    const Extent told{status, sizeof *status, count};
-    if (!told.fits()) return false;
-    for (const double* const input : inputs) {
-        const Extent in{input, sizeof *input, count};
-        if (!in.fits() || in.overlaps(told)) return false;
-    }
-    for (auto output = outputs.begin(); output != outputs.end(); ++output) {
-        const Extent out{*output, sizeof **output, count};
-        if (!out.fits() || out.overlaps(told)) return false;
-        for (const double* const input : inputs) {
-            const Extent in{input, sizeof *input, count};
-            if (in.overlaps(out) && !in.same(out)) return false;
-        }
-        for (auto other = outputs.begin(); other != output; ++other)
-            if (out.overlaps({*other, sizeof **other, count})) return false;
-    }
-    return true;
-}
+using quo::lie_well;
 
 /** A piece of the arrays that makes one block. */
 struct Piece {
