@@ -17,4 +17,8 @@ PYBIND11_MODULE(_core, module) {
     quo_python::bind_raster(module);
     quo_python::bind_header(module);
     quo_python::bind_times(module);
+    quo_python::bind_models(module);
+    quo_python::bind_parameters(module);
+    quo_python::bind_signal(module);
+    quo_python::bind_import(module);
 }

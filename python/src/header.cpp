@@ -55,8 +55,7 @@ std::vector<std::string> sections_of(const GeneralSAR& all, Wanted wanted) {
 
 }  // namespace
 
-// --- Files
-// --------------------------------------------------------------------------------------------------------
+// --- Files ------------------------------------------------------------------------------------------------------
 
 std::shared_ptr<Header> Header::read(const std::string& file) {
     auto header = std::make_shared<Header>();
@@ -104,8 +103,7 @@ int Header::copy_to(Header& other) const {
     return grid_.clone(&other.grid_);
 }
 
-// --- Sections
-// -----------------------------------------------------------------------------------------------------
+// --- Sections ---------------------------------------------------------------------------------------------------
 
 std::vector<std::string> Header::sections() {
     std::vector<std::string> sections =
@@ -195,8 +193,7 @@ void Header::enable(const std::string& section, bool present) {
     (void)(present ? all_.GSenable(*object) : all_.GSdisable(*object));
 }
 
-// --- What is asked of a header
-// ------------------------------------------------------------------------------------
+// --- What is asked of a header ----------------------------------------------------------------------------------
 
 Orbit Header::orbit() const {
     if (!all_.GSexists(gsStateVectors)) raise(QUO_REFUSED, "the product has no orbit");
@@ -230,8 +227,7 @@ std::shared_ptr<const polySAR> Header::polynomials() const {
     return copy;
 }
 
-// --- Evaluation of polynomials
-// ------------------------------------------------------------------------------------
+// --- Evaluation of polynomials ----------------------------------------------------------------------------------
 
 namespace {
 

@@ -63,8 +63,7 @@ Doubles vectors_of(const Orbit& orbit, const double* StateVectors::*which) {
     return Doubles{std::vector<py::ssize_t>{vectors.count, 3}, vectors.*which};
 }
 
-// --- Arrays of points
-// ---------------------------------------------------------------------------------------------
+// --- Arrays of points -------------------------------------------------------------------------------------------
 
 struct GroundOutput {
     const char* name;

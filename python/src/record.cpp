@@ -70,22 +70,6 @@ py::object texts(const parElement& element) {
     return list;
 }
 
-py::object value_of(const parElement& element) {
-    switch (element.type) {
-        case parElement::typeDouble:
-            return numbers<double>(element);
-        case parElement::typeFloat:
-            return numbers<float>(element);
-        case parElement::typeInt:
-            return numbers<std::int32_t>(element);
-        case parElement::typeString:
-            return texts(element);
-        case parElement::typeNone:
-            break;
-    }
-    return py::none();
-}
-
 /** The items of a sequence that must have as many as the element. */
 py::list items_of(const parElement& element, const py::handle& value) {
     const bool array = py::isinstance<py::array>(value);
@@ -142,8 +126,23 @@ bool is_single(const parElement& element) { return element.scalar && !element.te
 
 }  // namespace
 
-// --- Record
-// -------------------------------------------------------------------------------------------------------
+// --- Record -----------------------------------------------------------------------------------------------------
+
+py::object value_of(const parElement& element) {
+    switch (element.type) {
+        case parElement::typeDouble:
+            return numbers<double>(element);
+        case parElement::typeFloat:
+            return numbers<float>(element);
+        case parElement::typeInt:
+            return numbers<std::int32_t>(element);
+        case parElement::typeString:
+            return texts(element);
+        case parElement::typeNone:
+            break;
+    }
+    return py::none();
+}
 
 GeneralSAR_Base& Record::object() const {
     GeneralSAR_Base* const object = find_();

@@ -49,6 +49,9 @@ private:
     Allocate allocate_;
 };
 
+/** Values of an element: a number, a text, an array that cannot be written, or a list of texts. */
+py::object value_of(const parElement& element);
+
 void bind_records(py::module_& module);
 
 }  // namespace quo_python
