@@ -49,6 +49,13 @@ class Region(_Model):
     _KIND = _core.Region
 
     @classmethod
+    def of_axes(cls, range_axis: tuple[float, float, int], azimuth_axis: tuple[Any, float, int]) -> Region:
+        """The region of two axes: start, step and count of the range times, s, and of the azimuth times."""
+        made = cls()
+        made._header.set_axes(*range_axis, to_seconds(azimuth_axis[0]), *azimuth_axis[1:])
+        return made
+
+    @classmethod
     def read(cls, path: Path, section: str = "ROI") -> Region:
         """The region of a section of a header or parameter file."""
         return cls._of(_core.Region.read(os.fspath(path), section))

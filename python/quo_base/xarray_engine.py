@@ -3,7 +3,7 @@
 from __future__ import annotations
 
 import os
-from typing import Any, Callable, Iterable, Optional
+from typing import Any, Iterable, Optional
 
 import numpy as np
 from xarray import Dataset, Variable
@@ -11,75 +11,83 @@ from xarray.backends import BackendArray, BackendEntrypoint
 from xarray.core import indexing
 
 from .errors import Error
-from .product import Grid, Product
+from .product import Product
+from .raster import Raster
 from .times import to_datetime64
 
 __all__ = ["QuoBackend"]
 
 
 class _LazyArray(BackendArray):
-    """A two-dimensional array of which `read(lines, samples)` makes blocks; each key is an integer or a slice."""
+    """A two-dimensional array of which read() makes blocks; each key is an integer or a slice."""
 
-    def __init__(self, shape: tuple[int, int], dtype: Any, read: Callable[[Any, Any], np.ndarray]) -> None:
+    def __init__(self, shape: tuple[int, int], dtype: Any) -> None:
         self.shape = shape
         self.dtype = np.dtype(dtype)
-        self._read = read
+
+    def read(self, lines: Any, samples: Any) -> np.ndarray:
+        raise NotImplementedError
 
     def __getitem__(self, key: indexing.ExplicitIndexer) -> np.ndarray:
         basic = indexing.IndexingSupport.BASIC
-        return indexing.explicit_indexing_adapter(key, self.shape, basic, lambda keys: self._read(*keys))
+        return indexing.explicit_indexing_adapter(key, self.shape, basic, lambda keys: self.read(*keys))
 
 
-def _lazy(*args: Any) -> indexing.LazilyIndexedArray:
-    return indexing.LazilyIndexedArray(_LazyArray(*args))
+class _Image(_LazyArray):
+    """The raster."""
+
+    def __init__(self, raster: Raster) -> None:
+        super().__init__(raster.shape, raster.dtype)
+        self._raster = raster
+
+    def read(self, lines: Any, samples: Any) -> np.ndarray:
+        return self._raster[lines, samples]
 
 
-def _image(product: Product, dtype: Any) -> Variable:
-    raster = product.raster if dtype is None else product.raster.astype(dtype)
-    lazy = _lazy(raster.shape, raster.dtype, lambda lines, samples: raster[lines, samples])
-    unit = product["DataSetInfo/UnitType"] if "DataSetInfo" in product else ""
-    return Variable(("line", "sample"), lazy, {"units": unit} if unit else {})
+class _Times(_LazyArray):
+    """Times of all pixels: "azimuth_time" or "range_time"."""
+
+    def __init__(self, product: Product, shape: tuple[int, int], which: str) -> None:
+        super().__init__(shape, "datetime64[ns]" if which == "azimuth_time" else "float64")
+        self._product = product
+        self._which = which
+
+    def read(self, lines: Any, samples: Any) -> np.ndarray:
+        line, sample = (np.arange(size)[key] for size, key in zip(self.shape, (lines, samples)))
+        if isinstance(lines, slice) and isinstance(samples, slice):
+            line = line[:, np.newaxis]
+        times = getattr(self._product.grid.times(line, sample), self._which)
+        return np.asarray(to_datetime64(times) if self._which == "azimuth_time" else times)
 
 
-def _azimuth_times(grid: Grid, lines: Any, samples: Any) -> np.ndarray:
-    return to_datetime64(grid.times(lines, samples).azimuth_time)
-
-
-def _range_times(grid: Grid, lines: Any, samples: Any) -> np.ndarray:
-    return np.asarray(grid.times(lines, samples).range_time)
-
-
-def _placed(times: Callable[[Grid, Any, Any], np.ndarray], grid: Grid, shape: tuple[int, int], dtype: str) -> Any:
-    """Times of all pixels, of which only what is asked for is computed."""
-    lines, samples = np.arange(shape[0]), np.arange(shape[1])
-
-    def read(line: Any, sample: Any) -> np.ndarray:
-        return np.asarray(times(grid, lines[line][..., np.newaxis] if isinstance(sample, slice) else lines[line], samples[sample]))
-
-    return _lazy(shape, dtype, read)
+def _coordinate(product: Product, shape: tuple[int, int], which: str, axis: Optional[int]) -> Any:
+    """Dimensions and times of pixels: along the one axis on which they change, else of all pixels, when asked for."""
+    times = _Times(product, shape, which)
+    if axis is None:
+        return ("line", "sample"), indexing.LazilyIndexedArray(times)
+    key = (slice(None), 0) if axis == 0 else (0, slice(None))
+    return ("line", "sample")[axis], times.read(*key)
 
 
 def _coordinates(product: Product, shape: tuple[int, int]) -> dict[str, Variable]:
-    """Lines and samples and, where the pixels have times, azimuth time and slant range time: along one axis where
-    they change along no other."""
-    lines, samples = np.arange(shape[0]), np.arange(shape[1])
-    made = {"line": Variable("line", lines), "sample": Variable("sample", samples)}
+    """Lines and samples and, where the pixels have times, azimuth time and slant range time."""
+    made = {name: Variable(name, np.arange(size)) for name, size in zip(("line", "sample"), shape)}
     try:
         grid = product.grid
     except Error:
         return made
-    both = ("line", "sample")
-    azimuth = ("line", _azimuth_times(grid, lines, 0)) if grid.lines_at_one_time else None
-    slant = ("sample", _range_times(grid, 0, samples)) if not grid.ground_range else None
-    made["azimuth_time"] = Variable(
-        *(azimuth or (both, _placed(_azimuth_times, grid, shape, "datetime64[ns]"))),
-        {"long_name": "zero-Doppler azimuth time"},
-    )
-    made["slant_range_time"] = Variable(
-        *(slant or (both, _placed(_range_times, grid, shape, "float64"))),
-        {"units": "s", "long_name": "two-way slant range time"},
-    )
+    azimuth = _coordinate(product, shape, "azimuth_time", 0 if grid.lines_at_one_time else None)
+    slant = _coordinate(product, shape, "range_time", None if grid.ground_range else 1)
+    made["azimuth_time"] = Variable(*azimuth, {"long_name": "zero-Doppler azimuth time"})
+    made["slant_range_time"] = Variable(*slant, {"units": "s", "long_name": "two-way slant range time"})
     return made
+
+
+def _image(product: Product, dtype: Any) -> Variable:
+    raster = product.raster if dtype is None else product.raster.astype(dtype)
+    unit = product["DataSetInfo/UnitType"] if "DataSetInfo" in product else ""
+    lazy = indexing.LazilyIndexedArray(_Image(raster))
+    return Variable(("line", "sample"), lazy, {"units": unit} if unit else {})
 
 
 class QuoBackend(BackendEntrypoint):

@@ -111,6 +111,12 @@ void bind_region(py::module_& module) {
              [](const Region& self, const std::string& file, const std::string& section) {
                  self.write([&](ROI_Obj& roi) { return roi.write_roi(file.c_str(), section.c_str()); });
              })
+        .def("set_axes",
+             [](const Region& self, double range_s, double range_step_s, int samples, double azimuth_s,
+                double azimuth_step_s, int lines) {
+                 (void)self.object().SetFastAxe(range_s, range_step_s, samples);
+                 (void)self.object().SetSlowAxe(azimuth_s, azimuth_step_s, lines);
+             })
         .def("intersect",
              [](const Region& self, const Region& other) {
                  Region shared;
