@@ -21,7 +21,7 @@ class Error(Exception):
     """A call of the library failed."""
 
     status: int = 1
-    """The library's status: 1 refused, 4 short read, 5 short write, 7 no memory, 9 not opened, 10 numeric, 12 not seen."""
+    """1 refused, 4 short read, 5 short write, 7 no memory, 9 not opened, 10 no numeric solution, 12 not seen."""
     entry: Optional[ReportEntry] = None
     """What the call reported last; None where it reported nothing."""
     system_error: int = 0

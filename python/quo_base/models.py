@@ -6,7 +6,7 @@ import os
 from typing import Any, ClassVar, NamedTuple, Union
 
 from . import _core
-from ._arrays import broadcast
+from ._arrays import broadcast, plain
 from .product import Section
 from .times import to_seconds
 
@@ -117,13 +117,13 @@ class Coregistration(_Model):
 
     def to_slave(self, range_time: Any, azimuth_time: Any) -> tuple[Any, Any]:
         """Range and azimuth times of the slave, s."""
-        made = self._header.to_slave(*broadcast(range_time, to_seconds(azimuth_time)))
-        return made[0][()], made[1][()]
+        made = plain(self._header.to_slave(*broadcast(range_time, to_seconds(azimuth_time))))
+        return made[0], made[1]
 
     def to_master(self, range_time: Any, azimuth_time: Any) -> tuple[Any, Any]:
         """Range and azimuth times of the master, s; not-a-number where the mapping has no inverse."""
-        made = self._header.to_master(*broadcast(range_time, to_seconds(azimuth_time)))
-        return made[0][()], made[1][()]
+        made = plain(self._header.to_master(*broadcast(range_time, to_seconds(azimuth_time))))
+        return made[0], made[1]
 
     def with_samples(self, master: Region, slave: Region) -> Coregistration:
         """The mapping whose sample form is made of its time form."""

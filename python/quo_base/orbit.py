@@ -7,7 +7,7 @@ from typing import Any, NamedTuple, Optional, Sequence
 import numpy as np
 
 from . import _core
-from ._arrays import broadcast, doubles
+from ._arrays import broadcast, contiguous, doubles, plain
 from .times import to_seconds
 
 __all__ = ["Finding", "Geometry", "Ground", "Orbit", "Sighting"]
@@ -67,7 +67,7 @@ class Sighting(NamedTuple):
 class Finding(NamedTuple):
     """What is wrong with the state vectors."""
 
-    index: int
+    vector: int
     """Number of the vector, from 0; -1 for the list as a whole."""
     size: float
     """How far it is off, in the unit that the text tells."""
@@ -101,8 +101,8 @@ class Orbit:
         (n, 3), m/s; wavelength: m, needed where a Doppler takes part; look: negative looks left, needed on the way
         to the ground.
         """
-        vectors = [np.require(doubles(each), requirements="CA") for each in (positions, velocities)]
-        self._orbit = _core.Orbit(float(to_seconds(first_time)), spacing, *vectors, wavelength, look)
+        held = [contiguous(doubles(each)) for each in (positions, velocities)]
+        self._orbit = _core.Orbit(float(to_seconds(first_time)), spacing, held[0], held[1], wavelength, look)
 
     @classmethod
     def _of(cls, orbit: _core.Orbit) -> Orbit:
@@ -174,7 +174,7 @@ class Orbit:
         return self._sighting(True, x, y, z, doppler)
 
     def _sighting(self, fixed: bool, *values: Any) -> Sighting:
-        return Sighting(*(each[()] for each in self._orbit.to_radar(fixed, *broadcast(*values))))
+        return Sighting(*plain(self._orbit.to_radar(fixed, *broadcast(*values))))
 
     def resample(self, spacing: float) -> Orbit:
         """The orbit with vectors at most `spacing` seconds apart, as precise as its own vectors allow."""

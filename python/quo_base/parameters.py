@@ -50,8 +50,11 @@ class ParameterFile:
         numbers = np.asarray(value)
         if numbers.ndim > 1 or numbers.dtype.kind not in "iuf":
             raise TypeError("a text, a number or a list of numbers is needed")
-        write = _core.set_parameter_numbers if numbers.dtype.kind == "f" else _core.set_parameter_integers
-        write(self.path, *key, numbers.ravel().tolist())
+        values = numbers.ravel().tolist()
+        if numbers.dtype.kind == "f":
+            _core.set_parameter_numbers(self.path, *key, values)
+        else:
+            _core.set_parameter_integers(self.path, *key, values)
         if not isinstance(value, (Sequence, np.ndarray)):
             _core.set_parameter_text(self.path, *key, self[key].strip("{}"))
 

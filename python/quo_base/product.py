@@ -9,7 +9,7 @@ from typing import Any, NamedTuple, Optional, Union
 import numpy as np
 
 from . import _core
-from ._arrays import broadcast
+from ._arrays import broadcast, plain
 from .orbit import Orbit
 from .raster import Raster
 from .times import to_seconds
@@ -54,7 +54,7 @@ class Section(MutableMapping):
 
     __slots__ = ("_header", "_name")
 
-    def __init__(self, header: _core.Header, name: str) -> None:
+    def __init__(self, header: Any, name: str) -> None:
         object.__setattr__(self, "_header", header)
         object.__setattr__(self, "_name", name)
 
@@ -115,7 +115,10 @@ class Section(MutableMapping):
 
     def __repr__(self) -> str:
         width = max((len(name) for name in self), default=0)
-        rows = [f"  {name:{width}}  {_shown(value)} {self.describe(name).unit}".rstrip() for name, value in self.items()]
+        rows = [
+            f"  {name:{width}}  {_shown(value)} {self.describe(name).unit}".rstrip()
+            for name, value in self.items()
+        ]
         return "\n".join([f"<Section {self._name}>", *rows])
 
     def _repr_html_(self) -> str:
@@ -168,18 +171,20 @@ class Grid:
         self._grid = grid
 
     bursts = property(lambda self: self._grid.bursts, doc="Number of bursts; 0 for an image without.")
-    ground_range = property(lambda self: self._grid.ground_range, doc="Whether samples are equally spaced on the ground.")
+    ground_range = property(
+        lambda self: self._grid.ground_range, doc="Whether samples are equally spaced on the ground."
+    )
     lines_at_one_time = property(
         lambda self: self._grid.lines_at_one_time, doc="Whether all samples of a line have one azimuth time."
     )
 
     def times(self, line: Any, sample: Any) -> PixelTimes:
         """Times of pixels; whole numbers are the centres of pixels."""
-        return PixelTimes(*(each[()] for each in self._grid.times(*broadcast(line, sample))))
+        return PixelTimes(*plain(self._grid.times(*broadcast(line, sample))))
 
     def pixels(self, azimuth_time: Any, range_time: Any) -> Pixels:
         """Pixels of times; they may lie outside the raster."""
-        return Pixels(*(each[()] for each in self._grid.pixels(*broadcast(to_seconds(azimuth_time), range_time))))
+        return Pixels(*plain(self._grid.pixels(*broadcast(to_seconds(azimuth_time), range_time))))
 
 
 class Product(Mapping):

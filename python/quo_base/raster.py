@@ -10,6 +10,7 @@ from typing import Any, Optional, Union
 import numpy as np
 
 from . import _core
+from ._arrays import contiguous
 
 __all__ = ["Raster", "RasterWriter"]
 
@@ -19,9 +20,10 @@ def _pair(kind: str) -> np.dtype:
 
 
 # By the library's cell types: the samples as they stand in the file, and the type that slices have unless told.
-_STORED = [np.dtype(kind) for kind in ("c8", "f4", "c16", "f8")]
+_STORED: list[np.dtype[Any]] = [np.dtype("c8"), np.dtype("f4"), np.dtype("c16"), np.dtype("f8")]
 _STORED += [_pair("i4"), np.dtype("i4"), _pair("i2"), np.dtype("i2"), _pair("i1"), np.dtype("i1")]
-_SLICED = [{4: np.dtype("c16"), 6: np.dtype("c8"), 8: np.dtype("c8")}.get(i, each) for i, each in enumerate(_STORED)]
+_WIDER: dict[int, np.dtype[Any]] = {4: np.dtype("c16"), 6: np.dtype("c8"), 8: np.dtype("c8")}
+_SLICED = [_WIDER.get(cell_type, stored) for cell_type, stored in enumerate(_STORED)]
 
 
 def _cell_type(dtype: Any) -> int:
@@ -87,7 +89,7 @@ def _storable(block: np.ndarray, kind: str) -> np.ndarray:
         dtype = np.dtype(np.complex128)
     elif dtype not in _STORED:
         dtype = np.dtype(np.complex128 if block.dtype.kind == "c" else np.float64)
-    return np.require(block.astype(dtype, casting="same_kind", copy=False), requirements="CA")
+    return contiguous(block.astype(dtype, casting="same_kind", copy=False))
 
 
 class Raster:
@@ -99,7 +101,11 @@ class Raster:
     """
 
     def __init__(
-        self, path: Union[str, os.PathLike, None] = None, *, header: Union[str, os.PathLike, None] = None, dtype: Any = None
+        self,
+        path: Union[str, os.PathLike, None] = None,
+        *,
+        header: Union[str, os.PathLike, None] = None,
+        dtype: Any = None,
     ) -> None:
         """The raster of a file, described by PATH.hdr, or the one that a product's header describes.
 
@@ -109,7 +115,7 @@ class Raster:
         if path is None and header is None:
             raise TypeError("a raster's file or a header is needed")
         self._path = None if path is None else os.fspath(path)
-        self._header = self._path + ".hdr" if header is None else os.fspath(header)
+        self._header = f"{self._path}.hdr" if header is None else os.fspath(header)
         self._wanted = None if dtype is None else np.dtype(dtype)
         if dtype is not None:
             _cell_type(dtype)
@@ -165,6 +171,14 @@ class Raster:
         self._reader.read(first_line, lines, samples.first, samples.count, _cell_type(self.dtype), block)
         return block[:, samples.slice]
 
+    def read_into(self, out: np.ndarray, first_line: int = 0, first_sample: int = 0) -> np.ndarray:
+        """Fills an array (lines, samples) of any type of samples, C-contiguous and writable, with the block that
+        begins there, and returns it: nothing is allocated or copied."""
+        if out.ndim != 2 or not out.dtype.isnative:
+            raise ValueError("an array of two dimensions in the machine's byte order is needed")
+        self._reader.read(first_line, out.shape[0], first_sample, out.shape[1], _cell_type(out.dtype), out)
+        return out
+
     def __setitem__(self, key: Any, value: Any) -> None:
         lines, samples = _spans(key, self.shape)
         block = _block(value, lines, samples)
@@ -202,7 +216,9 @@ class RasterWriter:
         self.path = os.fspath(path)
         self.shape = (operator.index(shape[0]), operator.index(shape[1]))
         self.dtype = _STORED[_cell_type(dtype)].newbyteorder(">" if byte_order == "big" else "<")
-        self._writer = _core.RasterWriter(self.path, *self.shape, _cell_type(dtype), byte_order == "big", row_prefix)
+        self._writer = _core.RasterWriter(
+            self.path, *self.shape, _cell_type(dtype), byte_order == "big", row_prefix
+        )
 
     def __setitem__(self, key: Any, value: Any) -> None:
         lines, samples = _spans(key, self.shape)

@@ -16,7 +16,7 @@ Path = Union[str, os.PathLike]
 class TiePoints(NamedTuple):
     """How far image grid and orbit are off the producer's tie points; 0 where the annotation has none."""
 
-    count: int
+    points: int
     """Number of tie points."""
     rms_line: float
     """Root mean square of the lines' differences."""
@@ -61,5 +61,7 @@ def import_product(
     """
     orbit = None if orbit_file is None else os.fspath(orbit_file)
     name = os.fspath(raster)
-    _, _, linked, *ties = _core.import_sentinel1(os.fspath(source), name, swath, polarization, orbit, link, progress)
+    _, _, linked, *ties = _core.import_sentinel1(
+        os.fspath(source), name, swath, polarization, orbit, link, progress
+    )
     return Imported(Product(name + ".hdr"), linked, TiePoints(*ties))

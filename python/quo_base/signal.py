@@ -7,9 +7,21 @@ from typing import Any, Callable, NamedTuple
 import numpy as np
 
 from . import _core
-from ._arrays import broadcast, doubles, samples
+from ._arrays import broadcast, contiguous, doubles, samples
 
-__all__ = ["Fit", "czt", "engine", "fast_length", "fft", "fft2", "least_squares", "irfft", "resize", "rfft", "sample_at"]
+__all__ = [
+    "Fit",
+    "czt",
+    "engine",
+    "fast_length",
+    "fft",
+    "fft2",
+    "least_squares",
+    "irfft",
+    "resize",
+    "rfft",
+    "sample_at",
+]
 
 
 def engine() -> str:
@@ -100,7 +112,8 @@ def sample_at(image: Any, line: Any, sample: Any, lowpass: int = 1) -> np.ndarra
 
     lowpass: from 1 to 64, narrows the band for places that are as far apart. Outside the image it is 0.
     """
-    return _core.sample_at(samples(image, np.complex64, 2), *broadcast(line, sample), lowpass)[()]
+    lines, places = broadcast(line, sample)
+    return _core.sample_at(samples(image, np.complex64, 2), lines, places, lowpass)[()]
 
 
 class Fit(NamedTuple):
@@ -118,4 +131,4 @@ class Fit(NamedTuple):
 
 def least_squares(a: Any, b: Any) -> Fit:
     """The x (columns,) that brings a x nearest to b: a (rows, columns), b (rows,). Dependent columns get 0."""
-    return Fit(*_core.least_squares(*(np.require(doubles(each), requirements="CA") for each in (a, b))))
+    return Fit(*_core.least_squares(*(contiguous(doubles(each)) for each in (a, b))))

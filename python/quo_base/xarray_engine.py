@@ -78,8 +78,10 @@ def _coordinates(product: Product, shape: tuple[int, int]) -> dict[str, Variable
         return made
     azimuth = _coordinate(product, shape, "azimuth_time", 0 if grid.lines_at_one_time else None)
     slant = _coordinate(product, shape, "range_time", None if grid.ground_range else 1)
-    made["azimuth_time"] = Variable(*azimuth, {"long_name": "zero-Doppler azimuth time"})
-    made["slant_range_time"] = Variable(*slant, {"units": "s", "long_name": "two-way slant range time"})
+    made["azimuth_time"] = Variable(azimuth[0], azimuth[1], {"long_name": "zero-Doppler azimuth time"})
+    made["slant_range_time"] = Variable(
+        slant[0], slant[1], {"units": "s", "long_name": "two-way slant range time"}
+    )
     return made
 
 
@@ -94,9 +96,9 @@ class QuoBackend(BackendEntrypoint):
     """Opens a product's header: the raster as the variable "image", read when it is asked for, with coordinates
     line, sample, azimuth_time and slant_range_time, and all header fields as attributes, "Section/field"."""
 
-    open_dataset_parameters = ["filename_or_obj", "drop_variables", "dtype"]
+    open_dataset_parameters = ("filename_or_obj", "drop_variables", "dtype")
 
-    def open_dataset(
+    def open_dataset(  # type: ignore[override]
         self, filename_or_obj: Any, *, drop_variables: Optional[Iterable[str]] = None, dtype: Any = None
     ) -> Dataset:
         product = Product(filename_or_obj)

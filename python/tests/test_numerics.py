@@ -33,7 +33,9 @@ def test_images_are_transformed_along_either_axis_and_both():
 
 
 def test_certified_fits_are_met():
-    rows = [line.split(",") for line in (DATA / "nist" / "wampler1.csv").read_text().splitlines() if line[0].isdigit()]
+    rows = [
+        line.split(",") for line in (DATA / "nist" / "wampler1.csv").read_text().splitlines() if line[0].isdigit()
+    ]
     x, y = np.array(rows, np.float64).T
     fit = signal.least_squares(np.vander(x, 6, increasing=True), y)
     np.testing.assert_allclose(fit.x, np.ones(6), rtol=1e-9)
@@ -61,18 +63,24 @@ def test_bad_input_is_refused(refused, doing):
 
 def test_regions_and_mappings_invert_each_other(tmp_path):
     region = Region.of_axes((0.0051, 1e-8, 300), (np.datetime64("2016-09-09T01:46:40"), 2e-3, 40))
-    assert region.samples(0.0051 + np.array([0.0, 17.4e-8])).tolist() == [0, 17] and region.lines(1e9 + 0.0301) == 15
+    assert (
+        region.samples(0.0051 + np.array([0.0, 17.4e-8])).tolist() == [0, 17] and region.lines(1e9 + 0.0301) == 15
+    )
     assert (region & Region.of_axes((0.0051 + 1e-6, 1e-8, 300), (1e9, 2e-3, 50))).Samples == 200
     region.save(tmp_path / "region.xml")
     assert Region.read(tmp_path / "region.xml") == region == pickle.loads(pickle.dumps(region))
-    mapping = Coregistration(RgFit=[3.0, 1.0, 1e-9, 0.0062], AzFit=[0.1, 2e-3, 1.0, 1e9], trg0_s=0.0051, taz0_s=1e9)
+    mapping = Coregistration(
+        RgFit=[3.0, 1.0, 1e-9, 0.0062], AzFit=[0.1, 2e-3, 1.0, 1e9], trg0_s=0.0051, taz0_s=1e9
+    )
     slave = mapping.to_slave(0.00513, 1e9 + np.arange(3))
     np.testing.assert_allclose(mapping.to_master(*slave), [[0.00513] * 3, 1e9 + np.arange(3)], rtol=1e-13)
     again = mapping.with_samples(region, region).with_times(region, region)
     np.testing.assert_allclose(again.to_slave(0.00513, 1e9)[0], slave[0][0], rtol=1e-9)
     line = Polynomial(pol=[1, 2, 3, 4, 5, 6, 7], trg0_s=0.5, taz0_s=10.0)
     x, y = np.array([0.1, -0.3]), 2.0
-    np.testing.assert_allclose(line(0.5 + x, 12.0), 1 + 2 * x + 3 * y + 4 * x * y + 5 * x**2 + 6 * x**3 + 7 * x**4)
+    np.testing.assert_allclose(
+        line(0.5 + x, 12.0), 1 + 2 * x + 3 * y + 4 * x * y + 5 * x**2 + 6 * x**3 + 7 * x**4
+    )
 
 
 def test_records_and_parameters_are_kept_in_files(tmp_path):
@@ -83,7 +91,11 @@ def test_records_and_parameters_are_kept_in_files(tmp_path):
     assert sorted(review(tmp_path / "records.xml").records) == sorted(Configuration.names())
     assert Configuration("AzimuthConf").describe("AntennaLength").unit == "m"
     parameters = ParameterFile(tmp_path / "chain.par")
-    parameters["Chain", "Name"], parameters["Chain", "Steps"], parameters["Chain", "Lines"] = "a b", [1.5, -2.0], 2**40
+    parameters["Chain", "Name"], parameters["Chain", "Steps"], parameters["Chain", "Lines"] = (
+        "a b",
+        [1.5, -2.0],
+        2**40,
+    )
     parameters.save()
     parameters.forget()
     assert parameters["Chain", "Name"] == "a b" and parameters["Chain", "Lines"] == str(2**40)

@@ -55,7 +55,10 @@ def test_arguments_are_broadcast_whatever_their_layout(scene_file):
         (ValueError, lambda orbit: Orbit(0.0, 10.0, np.zeros((4, 3)), np.zeros((4, 3)))),
         (ValueError, lambda orbit: Orbit(0.0, 10.0, np.zeros((5, 3)), np.zeros((5, 2)))),
         (Refused, lambda orbit: Orbit(0.0, 10.0, orbit.positions, orbit.velocities).to_ground(0.0, 0.005)),
-        (Refused, lambda orbit: Orbit(0.0, 10.0, orbit.positions, orbit.velocities).to_radar(0.0, 0.0, doppler=1.0)),
+        (
+            Refused,
+            lambda orbit: Orbit(0.0, 10.0, orbit.positions, orbit.velocities).to_radar(0.0, 0.0, doppler=1.0),
+        ),
     ],
 )
 def test_bad_input_is_refused(scene_file, refused, doing):
@@ -75,7 +78,7 @@ def test_positions_follow_the_vectors_and_velocities_their_slope(scene_file):
     assert np.isnan(orbit.position([np.nan, middle])).tolist() == [[True] * 3, [False] * 3]
     broken = orbit.positions
     broken[7] = broken[6]
-    assert 7 in [found.index for found in Orbit(0.0, 10.0, broken, orbit.velocities).check()]
+    assert 7 in [found.vector for found in Orbit(0.0, 10.0, broken, orbit.velocities).check()]
 
 
 def test_times_are_those_of_the_calendar():

@@ -30,7 +30,13 @@ def test_copies_have_the_same_content_and_a_life_of_their_own(scene_file, tmp_pa
 def test_lengths_and_arrays_stay_together(scene_file):
     product = Product(scene_file)
     vectors, before = product.StateVectorData, dict(product.StateVectorData)
-    refused = [dict(nSV_n=17, pSV_m=[1.0] * 48), dict(nSV_n=-1), dict(nSV_n=2**31), dict(t0SV_s="1"), dict(vSV_mOs=[1])]
+    refused = [
+        dict(nSV_n=17, pSV_m=[1.0] * 48),
+        dict(nSV_n=-1),
+        dict(nSV_n=2**31),
+        dict(t0SV_s="1"),
+        dict(vSV_mOs=[1]),
+    ]
     for fields in refused:
         with pytest.raises((ValueError, TypeError)):
             vectors.update(fields)
@@ -57,7 +63,11 @@ def test_counts_of_polynomials_keep_those_that_stay(scene_file):
     [
         (1, Refused, lambda product, folder: Product(folder / "absent.hdr")),
         (5, FileError, lambda product, folder: product.save(folder / "absent" / "x.hdr")),
-        (5, FileError, lambda product, folder: product.DataSetInfo.update(Track="\x01") or product.save(folder / "x")),
+        (
+            5,
+            FileError,
+            lambda product, folder: product.DataSetInfo.update(Track="\x01") or product.save(folder / "x"),
+        ),
         (10, NumericError, lambda product, folder: product.evaluate("DC", 0.0055, 0.0)),
         (1, Refused, lambda product, folder: product.orbit.resample(0.0)),
     ],

@@ -45,6 +45,13 @@ def test_written_blocks_are_converted(tmp_path):
     raster[0] = 7
     samples[2:4, 1], samples[0] = [2, -32768], 7
     assert np.array_equal(raster, samples) and raster.astype("f8")[2, 1] == 2.0
+    assert np.array_equal(raster.read_into(np.empty((3, 2)), 2, 1), samples[2:5, 1:3])
+    read_only = np.zeros((2, 2))
+    read_only.flags.writeable = False
+    for out in (read_only, np.zeros((2, 4))[:, ::2], np.zeros((2, 2), ">f8"), np.zeros(4), np.zeros((2, 7))):
+        with pytest.raises(ValueError):
+            raster.read_into(out)
+        assert not out.any()
 
 
 def test_nothing_is_read_before_it_is_asked_for(tmp_path):

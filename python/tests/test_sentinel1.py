@@ -14,12 +14,24 @@ LINES, SAMPLES = 4503, 22694
 def write_sparse_tiff(path):
     """Complex 16-bit samples in one strip, all zero and none of them on the disk."""
     size = LINES * SAMPLES * 4
-    tags = [(256, SAMPLES), (257, LINES), (258, 32), (259, 1), (262, 1), (273, 8), (277, 1), (278, LINES), (279, size)]
+    tags = [
+        (256, SAMPLES),
+        (257, LINES),
+        (258, 32),
+        (259, 1),
+        (262, 1),
+        (273, 8),
+        (277, 1),
+        (278, LINES),
+        (279, size),
+    ]
     tags.append((339, 5))
     with open(path, "wb") as file:
         file.write(struct.pack("<2sHI", b"II", 42, 8 + size))
         file.seek(8 + size)
-        file.write(struct.pack("<H", len(tags)) + b"".join(struct.pack("<HHII", tag, 4, 1, value) for tag, value in tags))
+        file.write(
+            struct.pack("<H", len(tags)) + b"".join(struct.pack("<HHII", tag, 4, 1, value) for tag, value in tags)
+        )
         file.write(struct.pack("<I", 0))
 
 
