@@ -78,10 +78,10 @@ class Finding(NamedTuple):
 class Orbit:
     """An orbit through equally spaced state vectors. It never changes, so threads may share it.
 
-    Times are azimuth times: seconds since 1985 or datetime64. Range times are two-way, in seconds. Doppler is in Hz,
-    positive while the target approaches. All arguments are broadcast against each other, and results have their
-    common shape; scalars give scalars. Points without a solution get not-a-number and a status. Array calls run
-    without the interpreter's lock.
+    Times are azimuth times: seconds since 1985 or datetime64. Range times are two-way, in seconds. Doppler is in
+    Hz, positive while the target approaches. All arguments are broadcast against each other, and results have
+    their common shape; scalars give scalars. Points without a solution get not-a-number and a status. Array calls
+    run without the interpreter's lock.
     """
 
     __slots__ = ("_orbit",)
@@ -158,7 +158,7 @@ class Orbit:
         return {name: values[()] for name, values in made.items()}
 
     def to_ground(self, azimuth_time: Any, range_time: Any, doppler: Any = None, height: Any = None) -> Ground:
-        """Where samples lie on the ground: at height (m, 0 unless given), seen with Doppler (Hz, 0 unless given)."""
+        """Where samples lie on the ground, at a height (m) and seen with a Doppler (Hz), 0 unless given."""
         return Ground(**self.quantities(Ground._fields[:-1], azimuth_time, range_time, doppler, height))
 
     def geometry(self, azimuth_time: Any, range_time: Any, doppler: Any = None, height: Any = None) -> Geometry:

@@ -199,7 +199,7 @@ class Product(Mapping):
     __slots__ = ("_header", "_path", "_raster")
 
     def __init__(self, path: Optional[Path] = None, raster: Optional[Path] = None) -> None:
-        """Opens the product of a header file, XML or one of the older parameter files; without one an empty product.
+        """Opens the product of a header file, XML or one of the older parameter files; else an empty product.
 
         raster: the raster's file, where it is another than the header's less its last four characters.
         """
@@ -210,7 +210,7 @@ class Product(Mapping):
     def _set(self, name: str, value: Any) -> None:
         object.__setattr__(self, name, value)
 
-    # --- Fields ---------------------------------------------------------------------------------------------------
+    # --- Fields --------------------------------------------------------------------------------------------------
 
     def __getitem__(self, path: str) -> Any:
         if self._header.record(path) is not None:
@@ -284,7 +284,7 @@ class Product(Mapping):
     def _repr_html_(self) -> str:
         return _html(self)
 
-    # --- Files and copies -----------------------------------------------------------------------------------------
+    # --- Files and copies ----------------------------------------------------------------------------------------
 
     path = property(lambda self: self._path, doc="Name of the header file; None for a product in memory.")
 
@@ -311,7 +311,7 @@ class Product(Mapping):
     def __reduce__(self) -> tuple:
         return _restored, (self._path, self._raster, {name: dict(section) for name, section in self.items()})
 
-    # --- Geometry and samples -------------------------------------------------------------------------------------
+    # --- Geometry and samples ------------------------------------------------------------------------------------
 
     @property
     def orbit(self) -> Orbit:
@@ -333,9 +333,9 @@ class Product(Mapping):
     def evaluate(self, quantity: str, range_time: Any, azimuth_time: Any, interpolate: bool = False) -> Any:
         """A quantity of the product's polynomials at range times (two-way, s) and azimuth times.
 
-        quantity: "DC" Doppler centroid, Hz; "FR" FM rate, Hz/s; "SL2GR" and "GR2SL" slant range to ground range and
-        back; "SL2THETA" incidence and "SL2PHI" look angle, degrees. interpolate: between the polynomials around the
-        azimuth time; else the one at or after it.
+        quantity: "DC" Doppler centroid, Hz; "FR" FM rate, Hz/s; "SL2GR" and "GR2SL" slant range to ground range
+        and back; "SL2THETA" incidence and "SL2PHI" look angle, degrees. interpolate: between the polynomials
+        around the azimuth time; else the one at or after it.
         """
         arrays = broadcast(range_time, to_seconds(azimuth_time))
         return self._header.evaluate(quantity, interpolate, *arrays)[()]

@@ -95,9 +95,9 @@ def _storable(block: np.ndarray, kind: str) -> np.ndarray:
 class Raster:
     """A raster file as a two-dimensional array that is read when it is sliced: lines, then samples.
 
-    `raster[100:200, ::2]` is a numpy array of `dtype`, in the machine's byte order. Nothing is read before, and each
-    slice reads only what lies between its first and last line and sample. Any number of threads may slice one raster
-    at a time. `raster[10, 5:9] = values` writes into the file.
+    `raster[100:200, ::2]` is a numpy array of `dtype`, in the machine's byte order. Nothing is read before, and
+    each slice reads only what lies between its first and last line and sample. Any number of threads may slice one
+    raster at a time. `raster[10, 5:9] = values` writes into the file, unless its samples have 8 bits.
     """
 
     def __init__(

@@ -61,7 +61,7 @@ class _Times(_LazyArray):
 
 
 def _coordinate(product: Product, shape: tuple[int, int], which: str, axis: Optional[int]) -> Any:
-    """Dimensions and times of pixels: along the one axis on which they change, else of all pixels, when asked for."""
+    """Dimensions and times of pixels: along the one axis on which they change, else of all, when asked for."""
     times = _Times(product, shape, which)
     if axis is None:
         return ("line", "sample"), indexing.LazilyIndexedArray(times)

@@ -23,11 +23,9 @@ struct Failure {
     int system_error = 0;       ///< what the system refused it; 0 where it refused nothing
 };
 
-/** Runs a call of the library, which gives a status, without the interpreter's lock. What `call` needs of Python
- * objects is taken out of them before. */
+/** Runs a call of the library, which gives a status, on objects that the interpreter's lock guards. */
 template <typename Call>
-Failure attempt(Call&& call) {
-    const py::gil_scoped_release unlocked;
+Failure attempt_locked(Call&& call) {
     (void)quorelReport::takeError();
     (void)quo_take_system_error();
     errno = 0;  // whatever ran before in this process
@@ -37,6 +35,14 @@ Failure attempt(Call&& call) {
     failure.system_error = quo_take_system_error();
     errno = 0;
     return failure;
+}
+
+/** The same without the interpreter's lock: on objects that nobody changes, or that nobody else has. What `call`
+ * needs of Python's objects is taken out of them before. */
+template <typename Call>
+Failure attempt(Call&& call) {
+    const py::gil_scoped_release unlocked;
+    return attempt_locked(std::forward<Call>(call));
 }
 
 /** Raises the exception of a failure; `doing` tells what was being done, such as "reading a block". */
@@ -52,6 +58,13 @@ void run(const char* doing, Call&& call) {
 
 /** Exceptions of the library become those of the package. */
 void translate_exceptions();
+
+/** As attempt_locked(). */
+template <typename Call>
+void run_locked(const char* doing, Call&& call) {
+    if (const Failure failure = attempt_locked(std::forward<Call>(call)); failure.status != QUO_OK)
+        raise(failure, doing);
+}
 
 }  // namespace quo_python
 

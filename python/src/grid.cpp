@@ -6,7 +6,7 @@
 namespace quo_python {
 
 Grid::Grid(const ImageGrid_Obj& grid) {
-    if (const int status = grid.clone(grid_.get())) raise(status, "copying a pixel grid");
+    run_locked("copying a pixel grid", [&] { return grid.clone(grid_.get()); });
 }
 
 namespace {

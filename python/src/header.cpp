@@ -91,7 +91,7 @@ int Header::write_all(const std::string& file, bool exact) {
 
 std::shared_ptr<Header> Header::clone() const {
     auto copy = std::make_shared<Header>();
-    run("copying a product header", [&] { return copy_to(*copy); });
+    run_locked("copying a product header", [&] { return copy_to(*copy); });
     return copy;
 }
 
@@ -208,7 +208,7 @@ Orbit Header::orbit() const {
 void Header::set_orbit(const Orbit& orbit) {
     const StateVectors from = orbit.vectors();
     SAROrbitStateVectors_Obj& to = all_.stateVectors;
-    run("taking over an orbit", [&] { return to.SVCreate(from.first_s, from.spacing_s, from.count); });
+    run_locked("taking over an orbit", [&] { return to.SVCreate(from.first_s, from.spacing_s, from.count); });
     const auto numbers = 3 * static_cast<std::size_t>(from.count);
     std::copy_n(from.positions_m, numbers, to.pSV_m);
     std::copy_n(from.velocities_m_s, numbers, to.vSV_mOs);
@@ -223,7 +223,7 @@ Grid Header::grid() const {
 std::shared_ptr<const polySAR> Header::polynomials() const {
     auto copy = std::make_shared<polySAR>();
     if (all_.GSexists(gsPolySAR))
-        if (const int status = all_.polynomials.clone(copy.get())) raise(status, "copying polynomials");
+        run_locked("copying polynomials", [&] { return all_.polynomials.clone(copy.get()); });
     return copy;
 }
 

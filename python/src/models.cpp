@@ -33,7 +33,7 @@ public:
     /** One that nobody changes while an array is worked on. */
     [[nodiscard]] std::unique_ptr<Object> snapshot() const {
         auto copy = std::make_unique<Object>();
-        if (const int status = object_->clone(copy.get())) raise(status, "copying an object");
+        run_locked("copying an object", [&] { return object_->clone(copy.get()); });
         return copy;
     }
     /** As it was read by `call(object)`. */
@@ -137,8 +137,9 @@ void bind_mapping(py::module_& module) {
     const auto array = py::arg().noconvert();
     const auto made = [](const Mapping& self, auto method, const Region& master, const Region& slave) {
         Mapping copy;
-        run("copying an object", [&] { return self.object().clone(&copy.object()); });
-        run("making the other form", [&] { return (copy.object().*method)(&master.object(), &slave.object()); });
+        run_locked("copying an object", [&] { return self.object().clone(&copy.object()); });
+        run_locked("making the other form",
+                   [&] { return (copy.object().*method)(&master.object(), &slave.object()); });
         return copy;
     };
     using FromRegions = int (Coregist::*)(const ROI_Obj*, const ROI_Obj*);
@@ -197,7 +198,7 @@ public:
     }
     void write(const std::string& file, int channel) const {
         const Configuration copy{record_->section()};
-        run("copying a configuration", [&] { return record_->clone(copy.record_.get()); });
+        run_locked("copying a configuration", [&] { return record_->clone(copy.record_.get()); });
         run("writing a configuration", [&] { return copy.record_->writepar(file.c_str(), channel); });
     }
     [[nodiscard]] std::optional<Record> record(const std::string& section) const {

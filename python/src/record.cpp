@@ -182,43 +182,44 @@ int Record::allocate() const { return allocate_ ? allocate_() : object().createB
 void Record::update(const py::dict& values) {
     for (const auto& [name, value] : values) (void)element(py::cast<std::string>(name));
     const py::dict before = content();
+    bool made_anew = false;
     try {
-        assign(values, before);
+        made_anew = set_singles(values, before);
+        if (made_anew) {
+            run_locked("making arrays", [this] { return allocate(); });
+            set_fitting_arrays(before);
+        }
+        for (const auto& [name, value] : values)
+            if (const parElement& array = element(py::cast<std::string>(name)); !is_single(array))
+                set_value(array, value);
     } catch (...) {
-        restore(before);
+        (void)set_singles(before, before);
+        if (made_anew && attempt_locked([this] { return allocate(); }).status != QUO_OK)
+            (void)set_singles(before, before);  // lengths that make no arrays, as those of a new object
+        set_fitting_arrays(before);
         throw;
     }
 }
 
-void Record::assign(const py::dict& values, const py::dict& before) {
-    bool lengths = false;
+/** Sets the single values; whether an integer has changed, which may be a length. */
+bool Record::set_singles(const py::dict& values, const py::dict& before) {
+    bool changed = false;
     for (const auto& [name, value] : values) {
         const parElement& single = element(py::cast<std::string>(name));
         if (!is_single(single)) continue;
         set_value(single, value);
-        lengths = lengths || (single.type == parElement::typeInt && !value_of(single).equal(before[name]));
+        changed = changed || (single.type == parElement::typeInt && !value_of(single).equal(before[name]));
     }
-    if (lengths) {
-        if (const int status = allocate()) raise(status, "arrays of these lengths cannot be had");
-        for (const auto& [name, value] : before) {
-            const parElement& array = element(py::cast<std::string>(name));
-            if (!is_single(array) && py::len(value) == static_cast<std::size_t>(std::max(array.count, 0)))
-                set_value(array, value);
-        }
-    }
-    for (const auto& [name, value] : values)
-        if (const parElement& array = element(py::cast<std::string>(name)); !is_single(array))
-            set_value(array, value);
+    return changed;
 }
 
-void Record::restore(const py::dict& before) {
-    const auto set_all = [&](bool single) {
-        for (const auto& [name, value] : before)
-            if (const parElement& each = element(py::cast<std::string>(name)); is_single(each) == single)
-                set_value(each, value);
-    };
-    set_all(true);
-    if (allocate() == QUO_OK) set_all(false);
+/** Sets the arrays that have as many values as those given. */
+void Record::set_fitting_arrays(const py::dict& values) {
+    for (const auto& [name, value] : values) {
+        const parElement& array = element(py::cast<std::string>(name));
+        if (!is_single(array) && py::len(value) == static_cast<std::size_t>(std::max(array.count, 0)))
+            set_value(array, value);
+    }
 }
 
 void bind_records(py::module_& module) {

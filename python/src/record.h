@@ -40,8 +40,8 @@ public:
 private:
     [[nodiscard]] const parElement& element(const std::string& name) const;
     [[nodiscard]] py::dict content() const;
-    void assign(const py::dict& values, const py::dict& before);
-    void restore(const py::dict& before);
+    bool set_singles(const py::dict& values, const py::dict& before);
+    void set_fitting_arrays(const py::dict& values);
     int allocate() const;
 
     std::string section_;
