@@ -85,10 +85,10 @@ def _block(value: Any, lines: _Span, samples: _Span) -> np.ndarray:
 def _storable(block: np.ndarray, kind: str) -> np.ndarray:
     """Values in a type that the library converts into samples of this kind."""
     dtype = block.dtype.newbyteorder("=")
-    if kind == "c" and block.dtype.kind in "biuf":
-        dtype = np.dtype(np.complex128)
-    elif dtype not in _STORED:
-        dtype = np.dtype(np.complex128 if block.dtype.kind == "c" else np.float64)
+    if dtype.kind == "c" or (kind == "c" and dtype.names is None):
+        dtype = np.dtype(np.complex64 if dtype == np.complex64 else np.complex128)
+    elif dtype not in _STORED or dtype == np.int8:
+        dtype = np.dtype(np.float64)
     return contiguous(block.astype(dtype, casting="same_kind", copy=False))
 
 
@@ -181,8 +181,7 @@ class Raster:
 
     def __setitem__(self, key: Any, value: Any) -> None:
         lines, samples = _spans(key, self.shape)
-        block = _block(value, lines, samples)
-        block = _storable(block, self.dtype.kind)
+        block = _storable(_block(value, lines, samples), self.dtype.kind)
         place = (lines.first, lines.count, samples.first, samples.count)
         if block.size:
             _core.overwrite(self.path, *place, _cell_type(block.dtype), block)

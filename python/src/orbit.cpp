@@ -147,12 +147,12 @@ Doubles along(const Orbit& orbit, int (GeneralSAROrbit::*vector)(double, double*
 }
 
 /** What is wrong with the vectors: number of the vector, size, text of each. */
-std::vector<py::tuple> check(const Orbit& orbit) {
+py::list check(const Orbit& orbit) {
     std::vector<SVFinding> findings;
     run("examining state vectors", [&] { return orbit.model().SVCheck(findings); });
-    std::vector<py::tuple> told;
+    py::list told;
     for (const SVFinding& finding : findings)
-        told.push_back(py::make_tuple(finding.index, finding.size, finding.text));
+        told.append(py::make_tuple(finding.index, finding.size, finding.text));
     return told;
 }
 

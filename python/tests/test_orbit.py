@@ -36,13 +36,14 @@ def test_arguments_are_broadcast_whatever_their_layout(scene_file):
         "swapped": (azimuth.astype(">f8")[:, None], slant.astype(">f8")),
         "strided": (np.repeat(azimuth, 2)[::2, None], np.repeat(slant, 3)[::3]),
         "backwards": (azimuth[::-1][::-1, None], slant[::-1][::-1]),
-        "masked": (np.ma.array(azimuth)[:, None], np.ma.array(slant, mask=False)),
     }
     for name, arguments in layouts.items():
         assert np.array_equal(orbit.to_ground(*arguments).latitude, plain), name
     assert orbit.to_ground(azimuth[1], slant[2]).latitude == plain[1, 2]
     assert orbit.to_ground(np.empty((0, 1)), slant).latitude.shape == (0, 4)
     assert np.isnan(orbit.to_ground(azimuth[0], [np.nan, 1.0]).latitude).all()
+    masked = np.ma.array(azimuth, mask=[False, True, False])
+    assert np.isnan(orbit.to_ground(masked, slant[0]).latitude).tolist() == [False, True, False]
 
 
 @pytest.mark.parametrize(

@@ -41,6 +41,9 @@ def test_lengths_and_arrays_stay_together(scene_file):
         with pytest.raises((ValueError, TypeError)):
             vectors.update(fields)
         assert vectors == before
+    with pytest.raises(KeyError):
+        product.add("Pulse", Colour=1)
+    assert "Pulse" not in product
     vectors.nSV_n = 7
     assert not vectors.pSV_m.any() and len(vectors.pSV_m) == 21
     product.orbit = Product(scene_file).orbit
@@ -76,5 +79,6 @@ def test_failures_tell_status_and_report_entry(scene_file, tmp_path, status, kin
     with pytest.raises(kind) as caught:
         doing(Product(scene_file), tmp_path)
     assert caught.value.status == status and caught.value.entry.message in str(caught.value)
+    assert caught.value.system_error == (getattr(caught.value, "errno", None) or 0)
     copy = pickle.loads(pickle.dumps(caught.value))
     assert isinstance(copy, Error) and copy.entry == caught.value.entry

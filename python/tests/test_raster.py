@@ -46,6 +46,10 @@ def test_written_blocks_are_converted(tmp_path):
     samples[2:4, 1], samples[0] = [2, -32768], 7
     assert np.array_equal(raster, samples) and raster.astype("f8")[2, 1] == 2.0
     assert np.array_equal(raster.read_into(np.empty((3, 2)), 2, 1), samples[2:5, 1:3])
+    made(tmp_path, "c8", byte_order="big")
+    Raster(tmp_path / "image")[8, 4:] = np.array([3, 4], "i2")
+    assert Raster(tmp_path / "image")[8, 4:].tolist() == [3, 4]
+    raster = Raster(tmp_path / "image")
     read_only = np.zeros((2, 2))
     read_only.flags.writeable = False
     for out in (read_only, np.zeros((2, 4))[:, ::2], np.zeros((2, 2), ">f8"), np.zeros(4), np.zeros((2, 7))):
