@@ -76,7 +76,7 @@ py::list items_of(const parElement& element, const py::handle& value) {
     if (!array && !py::isinstance<py::sequence>(value)) throw py::type_error("a sequence is needed");
     py::object values = py::reinterpret_borrow<py::object>(value);
     if (array) values = values.attr("ravel")().attr("tolist")();
-    const py::list items(values);
+    py::list items(values);
     if (items.size() != static_cast<std::size_t>(std::max(element.count, 0)))
         throw py::value_error(std::to_string(element.count) + " values are needed, not " +
                               std::to_string(items.size()));
@@ -160,6 +160,7 @@ const parElement& Record::element(const std::string& name) const {
 std::vector<std::string> Record::names() const {
     const GeneralSAR_Base& held = object();
     std::vector<std::string> names;
+    names.reserve(static_cast<std::size_t>(held.elementCount()));
     for (int i = 0; i < held.elementCount(); ++i) names.emplace_back(held.element(i)->name);
     return names;
 }
