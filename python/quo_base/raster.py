@@ -131,6 +131,8 @@ class Raster:
         return _reopened, (self._path, self._header, self._wanted)
 
     def __repr__(self) -> str:
+        if self._opened is None:
+            return f"<Raster: {self.path}>"
         return f"<Raster: {self.path}, {self.shape[0]} lines of {self.shape[1]} samples, {self.dtype}>"
 
     path = property(lambda self: self._path or self._header[:-4], doc="Name of the raster file.")

@@ -69,6 +69,7 @@ def test_nothing_is_read_before_it_is_asked_for(tmp_path):
     os.remove(tmp_path / "image")
     with pytest.raises(FileError):
         raster[0]
+    assert "absent" in repr(Raster("absent"))
 
 
 def test_threads_share_a_raster(tmp_path):
