@@ -320,7 +320,7 @@ class Product(Mapping):
 
     @property
     def grid(self) -> Grid:
-        """Where the pixels stand in time: the section "ImageGrid", or the region of an image without."""
+        """Where pixels stand in time: the section "ImageGrid", else the region that the file told."""
         return Grid(self._header.grid())
 
     @property
