@@ -2,6 +2,8 @@
 
 from . import errors, sentinel1, signal, times
 from .errors import Error, FileError, NumericError, OutOfMemory, Refused
+from .jobs import Job, Outcome, run
+from .mapping import geocode
 from .orbit import Orbit
 from .parameters import ParameterFile
 from .models import Configuration, Coregistration, Polynomial, Region
@@ -13,9 +15,11 @@ __all__ = [
     "Coregistration",
     "Error",
     "FileError",
+    "Job",
     "NumericError",
     "Orbit",
     "OutOfMemory",
+    "Outcome",
     "ParameterFile",
     "Polynomial",
     "Product",
@@ -24,6 +28,8 @@ __all__ = [
     "Refused",
     "Region",
     "errors",
+    "geocode",
+    "run",
     "sentinel1",
     "signal",
     "times",

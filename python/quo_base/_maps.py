@@ -7,11 +7,12 @@ from typing import Any, NamedTuple, Optional
 
 import numpy as np
 
+from . import _core
+from ._arrays import broadcast
+
 RESAMPLINGS = ("nearest", "bilinear", "sinc")
 _HEIGHTS = {"ellipsoid": None, "egm96": "EPSG:4326+5773", "egm2008": "EPSG:4326+3855"}
 _SINC = 8  # samples each way
-# Arithmetic of WGS84, m.
-_A, _B = 6378137.0, 6356752.314245179
 
 
 def _horizontal(crs: Any) -> str:
@@ -265,11 +266,7 @@ def resample(raster: Any, line: np.ndarray, sample: np.ndarray, how: str) -> np.
 
 def earth_fixed(latitude: np.ndarray, longitude: np.ndarray, height: np.ndarray) -> np.ndarray:
     """Earth-fixed places, shape of the latitudes and 3, m."""
-    phi, lam = np.radians(latitude), np.radians(longitude)
-    east = _A * _A / np.hypot(_A * np.cos(phi), _B * np.sin(phi))
-    out = (east + height) * np.cos(phi)
-    up = (east * (_B / _A) ** 2 + height) * np.sin(phi)
-    return np.stack([out * np.cos(lam), out * np.sin(lam), up], axis=-1)
+    return _core.earth_fixed(*broadcast(latitude, longitude, height))
 
 
 def terrain_normals(ground: np.ndarray) -> np.ndarray:
@@ -292,8 +289,9 @@ def horizontal(sight: np.ndarray, latitude: np.ndarray, longitude: np.ndarray) -
 
 def map_steps(east: Any, north: Any, latitude: np.ndarray, longitude: np.ndarray, grid: MapGrid) -> Any:
     """Rows and columns of the map that one pixel's length on the ground towards the platform leads over."""
-    ahead_latitude = latitude + np.degrees(grid.pixel_m * north / _A)
-    ahead_longitude = longitude + np.degrees(grid.pixel_m * east / (_A * np.cos(np.radians(latitude))))
+    per_degree_m = 111195.0  # to the half percent that the Earth is no sphere
+    ahead_latitude = latitude + grid.pixel_m * north / per_degree_m
+    ahead_longitude = longitude + grid.pixel_m * east / (per_degree_m * np.cos(np.radians(latitude)))
     there = _transformer("EPSG:4326", grid.crs)
     x0, y0 = there.transform(longitude, latitude)
     x1, y1 = there.transform(ahead_longitude, ahead_latitude)

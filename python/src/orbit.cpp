@@ -9,6 +9,7 @@
 
 #include "arrays.h"
 #include "errors.h"
+#include "quo_base/geometry.h"
 
 namespace quo_python {
 
@@ -156,10 +157,24 @@ py::list check(const Orbit& orbit) {
     return told;
 }
 
+Doubles earth_fixed(const Doubles& latitude_deg, const Doubles& longitude_deg, const Doubles& height_m) {
+    if (latitude_deg.size() != longitude_deg.size() || latitude_deg.size() != height_m.size())
+        throw py::value_error("arrays of different sizes");
+    auto shape = shape_of(latitude_deg);
+    shape.push_back(3);
+    Doubles xyz_m{shape};
+    double* to = xyz_m.mutable_data();
+    const py::gil_scoped_release released;
+    for (py::ssize_t i = 0; i < latitude_deg.size(); ++i, to += 3)
+        quo::store(quo::from_geodetic({latitude_deg.data()[i], longitude_deg.data()[i], height_m.data()[i]}), to);
+    return xyz_m;
+}
+
 }  // namespace
 
 void bind_orbit(py::module_& module) {
     const auto array = py::arg().noconvert();
+    module.def("earth_fixed", &earth_fixed, array, array, array);
     py::class_<Orbit>(module, "Orbit")
         .def(py::init(&orbit_of_arrays), py::arg(), py::arg(), array, array, py::arg(), py::arg())
         .def("resampled", &Orbit::resampled)

@@ -1,0 +1,144 @@
+"""Maps and jobs: places against the array calls, terrain against its geometry, outputs whole or absent."""
+
+import os
+import pickle
+
+import numpy as np
+import pytest
+import quo_base
+from conftest import DATA, SCENES
+from quo_base import Job, Product, geocode, run
+
+rasterio = pytest.importorskip("rasterio")
+pytest.importorskip("xarray")
+LINES, SAMPLES = 600, 2000
+
+
+@pytest.fixture(scope="module")
+def product(tmp_path_factory):
+    """A part of a real scene whose amplitudes are large near whole minutes of latitude."""
+    path = str(tmp_path_factory.mktemp("map") / "image")
+    scene = Product(DATA / "scenes" / (SCENES[0] + ".xml"))
+    made = scene.clone()
+    region = {"SlowStartTime": 1167930362.0, "SlowTimeDelta": 2.0555e-3, "Lines": LINES, "SlowTimeLength": 2.0555e-3 * LINES}
+    region |= {"FastStartTime": 0.0055, "FastTimeDelta": 1.5541e-8, "Samples": SAMPLES, "FastTimeLength": 1.5541e-8 * SAMPLES}
+    made.add("ROI", **region)
+    line, sample = np.meshgrid(np.arange(LINES), np.arange(SAMPLES), indexing="ij")
+    seen = made.orbit.to_ground(1167930362.0 + 2.0555e-3 * line, 0.0055 + 1.5541e-8 * sample)
+    with quo_base.RasterWriter(path, (LINES, SAMPLES), np.float32) as writer:
+        writer[:] = 1.0 + np.cos(2 * np.pi * 120 * seen.latitude)
+    made.save(path + ".hdr", exact=True)
+    return Product(path + ".hdr")
+
+
+def write_model(path, heights, corner, step, crs="EPSG:4326"):
+    transform = rasterio.transform.from_origin(*corner, step, step)
+    rows, columns = heights.shape
+    shape = {"height": rows, "width": columns, "count": 1, "dtype": "float32"}
+    with rasterio.open(path, "w", driver="GTiff", crs=crs, transform=transform, **shape) as file:
+        file.write(heights.astype(np.float32), 1)
+    return path
+
+
+@pytest.fixture
+def flat(product, tmp_path):
+    """Sea level around the middle of the image."""
+    times = product.grid.times(LINES / 2, SAMPLES / 2)
+    middle = product.orbit.to_ground(times.azimuth_time, times.range_time)
+    corner = (middle.longitude - 0.02, middle.latitude + 0.003)
+    return write_model(tmp_path / "flat.tif", np.zeros((60, 400)), corner, 1e-4)
+
+
+@pytest.mark.parametrize("resampling, most", [("nearest", 0.15), ("bilinear", 0.02), ("sinc", 0.003)])
+def test_what_depends_on_latitude_alone_is_the_same_along_every_row(product, flat, resampling, most):
+    made = geocode(product, flat, resampling=resampling, heights="ellipsoid")
+    expected = 1.0 + np.cos(2 * np.pi * 120 * made.y.values)
+    assert made.image.shape == (60, 400)
+    assert np.nanmax(np.abs(made.image.values - expected[:, np.newaxis])) < most
+
+
+def test_tiles_are_the_whole_on_any_scheduler_and_travel_small(product, flat):
+    wanted = {"quantities": ("image", "line", "mask", "local_incidence", "incidence"), "heights": "ellipsoid"}
+    whole, tiles = geocode(product, flat, **wanted), geocode(product, flat, chunks=32, **wanted)
+    assert len(pickle.dumps(tiles.image.data.dask)) < 20000
+    for name, values in tiles.compute(scheduler="threads").items():
+        np.testing.assert_array_equal(values, whole[name])
+    assert not whole["mask"].any()
+    inner = (slice(2, -2), slice(2, -2))  # on flat ground the terrain's normal is the ellipsoid's
+    np.testing.assert_allclose(whole.local_incidence[inner], whole.incidence[inner], atol=0.02)
+
+
+def test_a_ridge_hides_and_overlays_what_its_geometry_says(product, tmp_path):
+    """A wall of 300 m across the line of sight: shadow on its far side, layover towards the radar."""
+    times = product.grid.times(LINES / 2, SAMPLES / 2)
+    middle = product.orbit.to_ground(times.azimuth_time, times.range_time)
+    crs = "EPSG:32632"
+    east, north = rasterio.warp.transform("EPSG:4326", crs, [middle.longitude], [middle.latitude])
+    x = np.abs(np.arange(200) - 100) * 10.0
+    heights = np.repeat(np.maximum(0.0, 300.0 - 3.0 * x)[np.newaxis], 40, axis=0)
+    path = write_model(tmp_path / "ridge.tif", heights, (east[0] - 1000, north[0] + 200), 10.0, crs)
+    made = geocode(product, path, quantities=["mask", "incidence"], heights="ellipsoid")
+    row = made["mask"].values[20]
+    angle = np.radians(float(made.incidence[20, 100]))
+    heading = product.orbit.velocity(times.azimuth_time)
+    across = 1.0 / np.cos(np.radians(12.0)) if heading is not None else 1.0  # the ridge is not quite along the track
+    assert np.sum(row & 2 > 0) * 10 == pytest.approx(300 * np.tan(angle) * across, abs=30)
+    assert np.sum(row & 1 > 0) * 10 == pytest.approx(300 / np.tan(angle) * across, abs=60)
+
+
+def test_heights_of_a_geoid_are_converted_or_refused_and_never_mixed(product, flat, tmp_path):
+    with pytest.raises(ValueError, match="does not name"):
+        geocode(product, flat)
+    sea = geocode(product, flat, quantities=["height"], heights="egm96").height.values
+    assert 40 < np.nanmin(sea) and np.nanmax(sea) < 55  # the geoid lies that high in middle Italy
+    named = write_model(tmp_path / "named.tif", np.zeros((60, 400)), (11.5, 41.5), 1e-4, "EPSG:4326+5773")
+    with pytest.raises(ValueError, match="EGM96"):
+        geocode(product, named, heights="ellipsoid")
+    with pytest.raises(ValueError, match="no place in common"):
+        far = write_model(tmp_path / "far.tif", np.zeros((9, 9)), (150.0, 10.0), 1e-3)
+        geocode(product, far, heights="ellipsoid")
+    for wrong in ({"resampling": "cubic"}, {"quantities": []}, {"quantities": ["height", "slope"]}, {"heights": "sea"}):
+        with pytest.raises(ValueError):
+            geocode(product, flat, **{"heights": "ellipsoid", **wrong})
+
+
+def _write(path, text, fail_once=None):
+    with open(path, "w") as file:
+        file.write(text)
+    if fail_once and not os.path.exists(fail_once):
+        open(fail_once, "w").close()
+        raise OSError("once")
+
+
+def _kill_once(path, mark):
+    _write(path, "half")
+    if not os.path.exists(mark):
+        open(mark, "w").close()
+        os._exit(1)
+    _write(path, "whole")
+
+
+def test_outputs_appear_whole_or_not_at_all(tmp_path):
+    jobs = [Job(str(tmp_path / str(i)), _write, (str(i),)) for i in range(5)]
+    jobs.append(Job(str(tmp_path / "again"), _write, ("again", str(tmp_path / "mark"))))
+    jobs.append(Job(str(tmp_path / "never"), _write, ()))
+    outcomes = run(jobs, progress=None)
+    assert [outcome.state for outcome in outcomes] == ["made"] * 6 + ["failed"] and "TypeError" in outcomes[-1].reason
+    assert sorted(os.listdir(tmp_path)) == ["0", "1", "2", "3", "4", "again", "mark"]
+    assert [outcome.state for outcome in run(jobs[:6], progress=None)] == ["skipped"] * 6
+    with pytest.raises(ValueError):
+        run(jobs[:1] * 2)
+
+
+def test_a_killed_worker_leaves_nothing_half(tmp_path, product, flat):
+    distributed = pytest.importorskip("distributed")
+    jobs = [Job(str(tmp_path / str(i)), _write, (str(i),)) for i in range(6)]
+    jobs.append(Job(str(tmp_path / "killed"), _kill_once, (str(tmp_path / "mark"),)))
+    whole = geocode(product, flat, heights="ellipsoid").image.values
+    with distributed.LocalCluster(2, threads_per_worker=1, dashboard_address=None) as cluster:
+        with distributed.Client(cluster) as client:
+            assert all(outcome.state != "failed" for outcome in run(jobs, client, progress=None))
+            tiles = geocode(product, flat, heights="ellipsoid", chunks=100).image.compute()
+    assert (tmp_path / "killed").read_text() == "whole"
+    assert not [name for name in os.listdir(tmp_path) if ".part-" in name]
+    np.testing.assert_array_equal(tiles.values, whole)
