@@ -28,7 +28,7 @@ int search_times(const OrbitModel& model, const Target& target, PointTimes* foun
 /** Whether a guess by straight flight, on the orbit and then on a run, leads far from the run that serves: it is
  * off by a tenth of a tenth of its distance from the orbit's middle, and a run serves for three spacings. */
 bool has_short_runs(const OrbitModel& model) noexcept {
-    constexpr std::int32_t kMostVectors = 400;
+    constexpr std::int32_t kMostVectors = 500;
     return model.vectors() > kMostVectors && model.arc_rad() <= kLongCoarseArc_rad;
 }
 
