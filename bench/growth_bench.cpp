@@ -3,12 +3,14 @@
 
 #include <benchmark/benchmark.h>
 
+#include <algorithm>
 #include <array>
 #include <cstddef>
 #include <cstdint>
 #include <filesystem>
 #include <map>
 #include <memory>
+#include <numeric>
 #include <random>
 #include <string>
 #include <vector>
@@ -76,6 +78,21 @@ void orbits(benchmark::internal::Benchmark* job) {
 }
 BENCHMARK(earth2sat<false>)->Name("earth2sat")->Apply(orbits);
 BENCHMARK(earth2sat<true>)->Name("earth2satPrecise")->Apply(orbits);
+
+/** One load that waits for the one before it, from anywhere in a table as large as the runs of so many vectors. */
+void waiting_load(State& state) {
+    struct Run {
+        std::size_t next, rest[19];
+    };
+    std::vector<std::size_t> order(static_cast<std::size_t>(state.range(0)));
+    std::iota(order.begin(), order.end(), std::size_t{0});
+    std::shuffle(order.begin(), order.end(), random_bits());
+    std::vector<Run> runs(order.size());
+    for (std::size_t i = 0; i < order.size(); ++i) runs[order[i]].next = order[(i + 1) % order.size()];
+    std::size_t at = 0;
+    for (auto _ : state) benchmark::DoNotOptimize(at = runs[at].next);
+}
+BENCHMARK(waiting_load)->Arg(160000);
 
 // --- polynomials ------------------------------------------------------------------------------------------------
 
@@ -177,7 +194,9 @@ int main(int argc, char** argv) {
             {"earth2sat: 16001 / 17 vectors over 160 s", "earth2sat/16001/160", "earth2sat/17/160", 2.0},
             {"earth2sat: 160001 / 17 vectors over 160 s", "earth2sat/160001/160", "earth2sat/17/160", 2.0},
             {"earth2sat: 9001 / 91 vectors over 900 s", "earth2sat/9001/900", "earth2sat/91/900", 2.0},
-            {"earth2sat: 160000 / 500 vectors 10 s apart", "earth2sat/160000/1599990", "earth2sat/500/4990", 10.0},
+            {"earth2sat: 160000 / 500 vectors 10 s apart", "earth2sat/160000/1599990", "earth2sat/500/4990", 5.0},
+            {"earth2sat: 160000, 10 s apart / waiting load", "earth2sat/160000/1599990", "waiting_load/160000",
+             10.0},
             {"earth2satPrecise: 16001 / 17 over 160 s", "earth2satPrecise/16001/160", "earth2satPrecise/17/160",
              2.0},
             {"EvaluateDC: 240000 / 10 polynomials", "choose/240000", "choose/10", 6.0},

@@ -283,4 +283,25 @@ TEST(BlockWriting, OfComplexIntoFloat64TakesTwoDoublesASample) {
     }
 }
 
+// At places that no vector is aligned to, and in chunks that end within a line.
+TEST(BlockReading, OfMoreThanACacheHoldsGivesTheSame) {
+    const test::TemporaryFolder folder;
+    constexpr int lines = 2101, width = 1003;
+    BufferFile file{folder.file("large").c_str()};
+    file.NrOfLinesPerImage = lines;
+    file.NrOfPixelsPerLine = width;
+    file.CellType = SHORT_COMPLEX;
+    file.ByteOrder = 1;
+    std::mt19937 random{17};
+    std::vector<float> written(2 * lines * width + 1), read = written;
+    std::ranges::generate(written, [&] { return static_cast<float>(static_cast<std::int16_t>(random())); });
+    const auto samples = [](std::vector<float>& of) { return reinterpret_cast<fcomplex*>(of.data() + 1); };
+    file.open(BufferFile::WRITE);
+    file.writebuffer(samples(written), 0, lines, 0, 0);
+    file.open(BufferFile::READ);
+    file.readbuffer(samples(read), 0, lines, 0, 0);
+    read[0] = written[0];
+    EXPECT_TRUE(read == written);
+}
+
 }  // namespace

@@ -149,9 +149,15 @@ std::size_t NameIndex::place_of(std::uint32_t hash) const noexcept {
     return place;
 }
 
-std::span<const Node> NameIndex::find(std::string_view name) const noexcept {
+std::span<const Node> NameIndex::find(const HeaderTree& tree, std::string_view name) const noexcept {
     if (slots_.empty()) return {};
+    if (!repeats_ && last_ != Node::none) {
+        const Node next = tree.next(last_);
+        if (!tree.is_named(last_, name) && next != Node::none) last_ = next;
+        if (tree.is_named(last_, name)) return {&last_, 1U};
+    }
     const Slot& slot = slots_[place_of(hash_of(name))];
+    last_ = slot.only;
     if (slot.group != 0) return groups_[slot.group - 1];
     return {&slot.only, slot.only == Node::none ? 0U : 1U};
 }
@@ -172,7 +178,12 @@ void NameIndex::add(const HeaderTree& tree, Node child) {
         groups_.push_back({slot.only});
         slot.group = static_cast<std::uint32_t>(groups_.size());
     }
-    if (slot.group != 0) return groups_[slot.group - 1].push_back(child);
+    if (slot.group != 0) {
+        std::vector<Node>& group = groups_[slot.group - 1];
+        const auto bears_it = [&](Node other) { return tree.is_named(other, tree.name(child)); };
+        repeats_ = repeats_ || std::ranges::any_of(group, bears_it);
+        return group.push_back(child);
+    }
     used_ += slot.hash == 0 ? 1 : 0;
     slot = {hash, 0, child};
 }
@@ -184,6 +195,7 @@ bool NameIndex::forget(const HeaderTree& tree, Node child) noexcept {
     // With several of the name the search for one would cost.
     if (slot.group != 0 || slot.only != child) return false;
     slot.only = Node::none;
+    last_ = Node::none;
     return true;
 }
 

@@ -21,7 +21,7 @@ class AtomicFile;
 class NameIndex {
 public:
     /** The children that bear the name, and now and then others: see HeaderTree::is_named. */
-    [[nodiscard]] std::span<const Node> find(std::string_view name) const noexcept;
+    [[nodiscard]] std::span<const Node> find(const HeaderTree& tree, std::string_view name) const noexcept;
     void add(const HeaderTree& tree, Node child);
     /** Forgets a child that goes; false when the index cannot do that at once. */
     bool forget(const HeaderTree& tree, Node child) noexcept;
@@ -38,6 +38,10 @@ private:
     std::vector<Slot> slots_;                // a power of two, half of them free
     std::vector<std::vector<Node>> groups_;  // of names that several bear
     std::size_t used_ = 0;
+    // Children are mostly looked for in their order, each several times. While no two bear one name, the one found
+    // last and the one after it are looked at before the table, which no cache holds.
+    mutable Node last_ = Node::none;
+    bool repeats_ = false;
 };
 
 /** One header document: the tree, and the look-ups and changes that the field layout needs. Paths are walked name
@@ -125,7 +129,7 @@ private:
         const auto go_on = [&](Node node) { return last ? see(node) : visit_below(node, rest, see); };
         const auto go_on_if_named = [&](Node node) { return !tree_.is_named(node, name) || go_on(node); };
         if (const NameIndex* index = index_of(parent))
-            return std::ranges::all_of(index->find(name), go_on_if_named);
+            return std::ranges::all_of(index->find(tree_, name), go_on_if_named);
         std::int64_t passed = 0;
         Node node = tree_.first(parent);
         for (; node != Node::none; node = tree_.next(node)) {

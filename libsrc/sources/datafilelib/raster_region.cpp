@@ -8,6 +8,10 @@
 #include <cerrno>
 #include <cstring>
 
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
+
 #include "diagnosticslib/call_frame.h"
 #include "sarutillib/ground/checked_size.h"
 
@@ -18,6 +22,8 @@ namespace {
 constexpr std::int64_t kChunk = std::int64_t{1} << 19;
 // More for writing, where each call costs a journal's entry beside the copying.
 constexpr std::int64_t kWriteChunk = 2 * kChunk;
+// An output as large as this may still stand in a cache when it is looked at.
+constexpr std::int64_t kMostCached = std::int64_t{16} << 20;
 // Pieces nearer to each other than this are read in one transfer with what lies between.
 constexpr std::int64_t kSmallGap = 4096;
 
@@ -38,6 +44,28 @@ bool describes_lines(const RasterDescription& raster) {
            raster.HeaderOffset >= 0;
 }
 
+/** Copies to memory that is not looked at soon; other threads may see it after order_stores(). */
+void store_past_caches(const char* from, char* to, std::size_t size) noexcept {
+#if defined(__SSE2__)
+    constexpr std::size_t kStore = sizeof(__m128i);
+    const std::size_t head = std::min(size, -reinterpret_cast<std::uintptr_t>(to) % kStore);
+    std::memcpy(to, from, head);
+    std::size_t done = head;
+    for (; done + kStore <= size; done += kStore) {
+        const __m128i value = _mm_loadu_si128(reinterpret_cast<const __m128i*>(from + done));
+        _mm_stream_si128(reinterpret_cast<__m128i*>(to + done), value);
+    }
+    std::memcpy(to + done, from + done, size - done);
+#else
+    std::memcpy(to, from, size);
+#endif
+}
+void order_stores() noexcept {
+#if defined(__SSE2__)
+    _mm_sfence();
+#endif
+}
+
 /** Moves a region chunk by chunk. */
 class RegionReader {
 public:
@@ -47,8 +75,9 @@ public:
     int run() {
         const bool grows = layout_.memory_piece >= region_.piece;
         const bool packed = layout_.memory_row == layout_.memory_piece;
-        if (region_.distance == region_.piece && packed && grows) return read_in_place();
-        return read_through_scratch();
+        if (region_.distance != region_.piece || !packed || !grows) return read_through_scratch();
+        const bool fits = region_.count * layout_.memory_piece <= kMostCached;
+        return fits || !layout_.kernel ? read_in_place() : read_past_caches();
     }
 
 private:
@@ -67,6 +96,30 @@ private:
             if (layout_.kernel) {
                 layout_.kernel(upper, room, static_cast<std::size_t>(pieces * layout_.samples), layout_.swap);
             }
+        }
+        return QUO_OK;
+    }
+
+    // Where no cache holds the whole output, its lines would be fetched from memory only to be overwritten:
+    // samples are converted in small pieces and stored past the caches.
+    int read_past_caches() {
+        constexpr std::int64_t kSmall = 4096;
+        const std::int64_t in = region_.piece / layout_.samples, out = layout_.memory_piece / layout_.samples;
+        const std::int64_t samples = region_.count * layout_.samples, at_once = kChunk / out, few = kSmall / out;
+        TrackedBuffer<char> scratch{static_cast<std::size_t>(at_once * in)};
+        if (!scratch) return QUO_NO_MEMORY;
+        alignas(64) char small[kSmall];
+        for (std::int64_t done = 0; done < samples; done += at_once) {
+            const std::int64_t now = std::min(at_once, samples - done);
+            const auto bytes = static_cast<std::size_t>(now * in);
+            if (stream_.read_at(region_.first + done * in, scratch.data(), bytes).bytes != bytes)
+                return QUO_READ_FAILED;
+            for (std::int64_t i = 0; i < now; i += few) {
+                const std::int64_t count = std::min(few, now - i);
+                layout_.kernel(scratch.data() + i * in, small, static_cast<std::size_t>(count), layout_.swap);
+                store_past_caches(small, to_ + (done + i) * out, static_cast<std::size_t>(count * out));
+            }
+            order_stores();
         }
         return QUO_OK;
     }

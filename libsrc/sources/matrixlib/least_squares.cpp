@@ -191,22 +191,23 @@ double norm(double* values, std::ptrdiff_t count) {
  * after the others. */
 class PivotedQr {
 public:
-    static std::size_t room(int cols) { return 3 * static_cast<std::size_t>(cols) + 2; }
-    /** `work` holds room() values, `order` one per column. */
-    PivotedQr(double* columns, int rows, int cols, double* work, int* order)
+    static std::size_t room(int cols) { return 2 * static_cast<std::size_t>(cols) + 1; }
+    /** `squares` are those of the columns' lengths, and scratch; `work` holds room() values, `order` one per
+     * column.
+     */
+    PivotedQr(double* columns, int rows, int cols, double* squares, double* work, int* order)
         : a_{columns},
           rows_{rows},
           cols_{cols},
           leads_{work},
-          squares_{work + cols},
-          factors_{squares_ + cols + 1},
+          squares_{squares},
+          factors_{work + cols},
           order_{order} {
         for (int j = 0; j < cols; ++j) order[j] = j;
     }
 
     /** Decomposes until what is left of every column is below `tolerance` times the first pivot. */
     int run(double tolerance) {
-        for (int j = 0; j <= cols_; ++j) kernels_.dots(column(j), {column(j), rows_, 1, rows_}, &squares_[j]);
         for (rank_ = 0; rank_ < cols_; ++rank_) {
             bring_longest_forward();
             const double length = std::sqrt(squares_[rank_]);
@@ -361,8 +362,10 @@ void scale(double* column, std::ptrdiff_t rows, int exponent) {
     for (std::ptrdiff_t i = 0; i < rows; ++i) column[i] *= factor;
 }
 
-// The columns of `a`, and `b` after them, scaled to lengths of about 1. False where a value is not finite.
-bool scale_columns(const double* a, const double* b, int rows, int cols, double* columns, int* exponents) {
+// The columns of `a`, and `b` after them, scaled to lengths of about 1, and the squares of these. False where a
+// value is not finite.
+bool scale_columns(const double* a, const double* b, int rows, int cols, double* columns, double* squares,
+                   int* exponents) {
     constexpr int kSquareFits = 400, kMost = 1000;  // 2^1000 is a number, and so is its inverse
     Transpose_Matrix(a, columns, rows, cols);
     std::copy_n(b, rows, columns + static_cast<std::ptrdiff_t>(cols) * rows);
@@ -373,9 +376,12 @@ bool scale_columns(const double* a, const double* b, int rows, int cols, double*
         std::frexp(largest, &exponents[j]);
         exponents[j] = std::abs(exponents[j]) < kSquareFits ? 0 : std::clamp(exponents[j], -kMost, kMost);
         if (exponents[j] != 0) scale(column, rows, -exponents[j]);
+        double square = 0.0;
         int length_exponent = 0;
-        std::frexp(norm(column, rows), &length_exponent);
+        dense_kernels().dots(column, {column, rows, 1, rows}, &square);
+        std::frexp(std::sqrt(square), &length_exponent);
         scale(column, rows, -length_exponent);
+        squares[j] = std::ldexp(square, -2 * length_exponent);
         exponents[j] += length_exponent;
     }
     return true;
@@ -404,15 +410,17 @@ int lsq_fit(const double* a, int rows, int cols, const double* b, double* x, Lsq
     const auto parameters = static_cast<std::size_t>(cols),
                elements = static_cast<std::size_t>(rows) * (parameters + 1);
     quo::TrackedBuffer<double> columns{elements}, scaled{elements};
+    quo::TrackedBuffer<double> squares{parameters + 1};
     quo::TrackedBuffer<double> work{PivotedQr::room(cols) + Refinement::room(rows, cols)};
     quo::TrackedBuffer<int> places{2 * parameters + 1};
-    if (!columns || !scaled || !work || !places) return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
+    if (!columns || !scaled || !squares || !work || !places)
+        return frame.fail(QUO_NO_MEMORY, "Memory allocation failure");
 
     int* const exponents = places.data() + cols;
-    if (!scale_columns(a, b, rows, cols, scaled.data(), exponents))
+    if (!scale_columns(a, b, rows, cols, scaled.data(), squares.data(), exponents))
         return frame.fail(QUO_NUMERIC, "A value to fit is not finite");
     std::copy_n(scaled.data(), elements, columns.data());
-    PivotedQr qr{columns.data(), rows, cols, work.data(), places.data()};
+    PivotedQr qr{columns.data(), rows, cols, squares.data(), work.data(), places.data()};
     LsqSummary found{
         .rank = qr.run(rows * 0x1p-52), .condition = qr.condition(), .residual_norm = qr.residual_norm()};
     qr.solve(x);

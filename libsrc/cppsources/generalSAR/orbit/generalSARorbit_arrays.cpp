@@ -201,7 +201,7 @@ int Obj::earth2sat(const OrbitTargets& targets, const OrbitSightings& seen) cons
     const quo::OrbitModel& model = *model_;
     const quo::OrbitView view = model.view(lambda_, static_cast<double>(look_sign_));
     const quo::ArrayKernels& kernels = quo::array_kernels();
-    const bool guessable = model.arc_rad() <= quo::kLongArc_rad;
+    const bool guessable = guessed_straight(model);
     quo::InverseBlock block;
     if (!guessable) std::ranges::fill(block.solved, 0);
     each_piece(targets.count, [&](const Piece& piece) {

@@ -126,6 +126,24 @@ double OrbitModel::coarse_guess(const Target& target) const noexcept {
     return seen.t_s;
 }
 
+bool OrbitModel::close_guess(const Target& target, double* since_first_s) const noexcept {
+    constexpr double kClose = 1e-2;  // spacings
+    const double rate = target.range_rate_m_s();
+    double t = mean_.time_of(target.point - run(0).start(), rate, kFirstRoot);
+    if (!std::isfinite(t)) return false;
+    for (int step = 0; step < kInverseSteps; ++step) {
+        const DopplerResidual at =
+            doppler_residual(orbit_state(OrbitSegment{coarse_x_, coarse_y_, coarse_z_}, t), target.point, rate);
+        const double change = at.value / at.slope;
+        t -= change;
+        // The next step's share of a flight as far as the target is away is about the square of this one's.
+        const double far_s = std::sqrt(at.range2_m2) * std::abs(mean_.per_speed);
+        if (change * change <= kClose * spacing() * far_s) break;
+    }
+    *since_first_s = t;
+    return std::isfinite(t);
+}
+
 int OrbitModel::solve_near(RunCursor& cursor, double* guess_since_first_s, const Target& target, double* t,
                            double* range_s) const noexcept {
     const double length = times_.run_length();

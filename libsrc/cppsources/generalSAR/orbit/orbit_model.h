@@ -110,6 +110,9 @@ public:
     }
     /** Time of a point on the coarse curve since the first vector, for a first guess. */
     double coarse_guess(const Target& target) const noexcept;
+    /** The same to about a hundredth of a spacing, from straight flight on and without a look at a run, as far as
+     * the coarse curve follows the orbit. False where the speed does not allow the range rate. */
+    bool close_guess(const Target& target, double* since_first_s) const noexcept;
     /** When the point is seen: Newton's method from a first guess, on the run in use made to suit it. `t` is on
      * the absolute scale. Where the solution leaves the middle of that run it is found again on the run that
      * serves there. 0, or 12 when it lies outside the run or the steps ran out; `t` and `range_s` then stay, and

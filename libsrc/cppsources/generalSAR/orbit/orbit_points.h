@@ -35,9 +35,8 @@ inline int find_ground(const RadarLook& look, OrbitSample* sample) noexcept {
                                   &sample->point);
 }
 
-/** On longer arcs straight flight is no guess: it leads to the far side of the Earth, where the equations have a
- * solution, too. */
-inline constexpr double kLongArc_rad = 5.0;
+/** Whether find_times() takes its first guess from straight flight, as the array kernels do. */
+bool guessed_straight(const OrbitModel& model) noexcept;
 
 /** When the point is seen: on the run that the first guess lands in, else by a search. 0 or 12. */
 int find_times(const OrbitModel& model, RunCursor& cursor, const Target& target, bool precise, double* t,

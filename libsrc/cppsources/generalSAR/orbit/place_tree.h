@@ -12,6 +12,7 @@ namespace quo {
 struct OrbitPlace {
     Vec3 at;
     std::int32_t run;
+    float least_radius_m = 0.0F;  // of all places in the part of the tree that this one parts
 };
 
 /** Orders places into a tree: the one in the middle parts the others by x, each half is a tree that begins with y,
