@@ -11,10 +11,6 @@ state=$( (git ls-files -co --exclude-standard -- '*.h' .clang-tidy | sort; echo 
     xargs -0 sha256sum | sha256sum | cut -d ' ' -f 1)
 stamp=$build/tidy-stamps/$state
 [ ! -e "$stamp" ] || exit 0
-# What the compiler has precompiled, clang cannot read; every source includes it as well.
-database=$(mktemp -d)
-trap 'rm -r "$database"' EXIT
-sed 's/ -Winvalid-pch -include [^ ]*//' "$build/compile_commands.json" >"$database/compile_commands.json"
-clang-tidy -p "$database" --quiet "$file"
+clang-tidy -p "$build" --quiet "$file"
 mkdir -p "$build/tidy-stamps"
 : >"$stamp"
