@@ -1,7 +1,8 @@
 #!/bin/sh
-# Runs the tests over a library that counts what ran, and fails where less than 97 % of its lines or 86 % of its
+# Runs the tests over a library that counts what ran, and fails where less than 97 % of its lines or 87 % of its
 # branches did. Branches that only an exception takes are left out, for the compiler puts one behind every call; so are
-# the tests that counting disturbs, and those whose processes end without telling what they counted.
+# the tests that counting disturbs, and of those that let system calls fail the tool's and the longest: each of their
+# thousands of processes adds its counts to the files.
 # Usage: scripts/check_coverage.sh [JOBS]
 set -eu
 cd "$(dirname "$0")/.."
@@ -9,11 +10,12 @@ jobs=${1:-$(nproc)}
 build=$PWD/build/coverage
 mkdir -p "$build"
 cmake -S . -B "$build" -G Ninja -DCMAKE_BUILD_TYPE=Coverage -DQUO_BUILD_BENCH=OFF \
-    -DCMAKE_C_FLAGS=--coverage -DCMAKE_CXX_FLAGS=--coverage >"$build/log"
+    -DCMAKE_C_FLAGS=--coverage -DCMAKE_CXX_FLAGS=--coverage \
+    -DCMAKE_EXE_LINKER_FLAGS=-Wl,-u,__gcov_dump >"$build/log"
 ninja -j "$jobs" -C "$build" >>"$build/log"
 find "$build" -name '*.gcda' -delete
 ctest --test-dir "$build" --output-on-failure -j "$jobs" -LE lint \
-    -E '^(faults|api.packages|profile.ProfileMemory)|OutputsWrittenInPlaceAreTold|Holds/config'
+    -E '^(faults.*/([a-z]|Read(Orbit|Product)|UseHandle)|faults.Kill|api.packages|profile.ProfileMemory)|OutputsWrittenInPlaceAreTold|Holds/config'
 find "$build/libsrc" -name '*.gcda' -exec gcov --json-format --stdout --branch-probabilities {} + | python3 -c '
 import json, os, sys
 lines, branches = {}, {}
@@ -29,4 +31,4 @@ for document in sys.stdin:
                     branches[one] = branches.get(one, 0) + branch["count"]
 shares = [100 * sum(map(bool, counts.values())) / len(counts) for counts in (lines, branches)]
 print("lines %.2f %%, branches %.2f %%" % tuple(shares))
-sys.exit(shares[0] < 97 or shares[1] < 86)'
+sys.exit(shares[0] < 97 or shares[1] < 87)'

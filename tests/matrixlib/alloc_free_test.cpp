@@ -41,6 +41,7 @@ void check_matrix(T** (*make)(int, int, int, int) noexcept, void (*release)(T**,
     for (int k = 0; k < 4 * 6; ++k)
         EXPECT_EQ(m[-2][3 + k], static_cast<T>(static_cast<float>(k))) << "without gaps";
     release(m, -2, 1, 3, 8);
+    EXPECT_FALSE(make(1, 0, 1, 4) || make(1, 3, 1, -1) || make(INT_MIN, INT_MAX, INT_MIN, INT_MAX));
 }
 TEST(Matrices, AreRowMajorWithoutGapsAndAreReleased) {
     check_matrix(matrix, free_matrix);
@@ -71,8 +72,8 @@ TEST(Matrices, AddressATensorAndTheMatrixUnderThem) {
 TEST(Allocators, RefuseWhatCannotBeWhileTrackingAndLeaveNothing) {
     const test::Report report;
     EXPECT_FALSE(dvector(1, -1) || dvector(5, INT_MIN));
-    EXPECT_FALSE(matrix(1, 0, 1, 4) || matrix(1, 3, 1, -1) || dmatrix(INT_MIN, INT_MAX, INT_MIN, INT_MAX));
-    EXPECT_FALSE(f3tensor(1, INT_MAX, 1, INT_MAX, 1, INT_MAX) || f3tensor(1, 2, 1, 0, 1, 2));
+    EXPECT_FALSE(f3tensor(1, INT_MAX, 1, INT_MAX, 1, INT_MAX) || f3tensor(1, 2, 1, 0, 1, 2) ||
+                 f3tensor(1, 0, 1, 2, 1, 2) || f3tensor(1, 2, 1, 2, 1, INT_MIN));
     EXPECT_EQ(convert_matrix(nullptr, 1, 0, 3, 1), nullptr);
     test::fail_every_allocation([] {
         double** m = dmatrix(1, 3, 1, 4);

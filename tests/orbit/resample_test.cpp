@@ -248,6 +248,8 @@ struct Spoilt {
 };
 const Spoilt kSpoilt[] = {
     {[](auto* p, auto*) { p[1] += 8.5; }, SVFinding::kPositionStep, 8.5},
+    // Half a spacing on: neither step to it tells how many vectors are missing.
+    {[](auto* p, auto*) { p[2] += 29317.0; }, SVFinding::kPositionStep, 29317.0},
     {[](auto*, auto* v) { v[2] -= 0.75; }, SVFinding::kVelocity, 0.75},
     {[](auto*, auto* v) { v[0] = kNaN; }, SVFinding::kNotFinite, 0.0},
     {[](auto* p, auto*) { std::fill_n(p, 3, 0.0); }, SVFinding::kInsideEarth, 0.0},
