@@ -10,6 +10,7 @@ from conftest import DATA, SCENES
 from quo_base import Job, Product, geocode, run
 
 rasterio = pytest.importorskip("rasterio")
+pyproj = pytest.importorskip("pyproj")
 pytest.importorskip("xarray")
 LINES, SAMPLES = 600, 2000
 
@@ -73,15 +74,17 @@ def test_a_ridge_hides_and_overlays_what_its_geometry_says(product, tmp_path):
     times = product.grid.times(LINES / 2, SAMPLES / 2)
     middle = product.orbit.to_ground(times.azimuth_time, times.range_time)
     crs = "EPSG:32632"
-    east, north = rasterio.warp.transform("EPSG:4326", crs, [middle.longitude], [middle.latitude])
+    east, north = pyproj.Transformer.from_crs("EPSG:4326", crs, always_xy=True).transform(*middle[1::-1])
     x = np.abs(np.arange(200) - 100) * 10.0
     heights = np.repeat(np.maximum(0.0, 300.0 - 3.0 * x)[np.newaxis], 40, axis=0)
-    path = write_model(tmp_path / "ridge.tif", heights, (east[0] - 1000, north[0] + 200), 10.0, crs)
+    path = write_model(tmp_path / "ridge.tif", heights, (east - 1000, north + 200), 10.0, crs)
     made = geocode(product, path, quantities=["mask", "incidence"], heights="ellipsoid")
     row = made["mask"].values[20]
     angle = np.radians(float(made.incidence[20, 100]))
-    heading = product.orbit.velocity(times.azimuth_time)
-    across = 1.0 / np.cos(np.radians(12.0)) if heading is not None else 1.0  # the ridge is not quite along the track
+    x, y, z = product.orbit.velocity(times.azimuth_time)
+    phi, lam = np.radians(middle[:2])
+    to_north = np.cos(phi) * z - np.sin(phi) * (np.cos(lam) * x + np.sin(lam) * y)
+    across = np.hypot(to_north, np.cos(lam) * y - np.sin(lam) * x) / to_north  # the ridge runs north, the track not quite
     assert np.sum(row & 2 > 0) * 10 == pytest.approx(300 * np.tan(angle) * across, abs=30)
     assert np.sum(row & 1 > 0) * 10 == pytest.approx(300 / np.tan(angle) * across, abs=60)
 
