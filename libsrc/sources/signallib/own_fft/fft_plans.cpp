@@ -20,7 +20,7 @@ struct RadixCost {
     int radix;
     double cost;
 };
-constexpr RadixCost kRadixCosts[] = {{16, 30.0}, {15, 35.0}, {14, 35.0}, {12, 28.0}, {10, 26.0},
+constexpr RadixCost kRadixCosts[] = {{16, 30.0}, {15, 42.0}, {14, 42.0}, {12, 28.0}, {10, 26.0},
                                      {9, 27.0},  {8, 21.0},  {7, 27.0},  {6, 21.0},  {5, 21.0},
                                      {4, 17.0},  {3, 18.0},  {2, 15.0}};
 /** Exchanging lanes and slots. */
@@ -71,8 +71,9 @@ int packs_of(int count, int lanes) { return count / lanes + (count % lanes != 0 
  * packs of one. The cost is that of one value. */
 Split split(PassChoice& passes, int length, int lanes) {
     Split best;
-    // Buffers beyond the first cache cost something.
-    const auto step = [&](int steps) { return passes.of(steps).cost + 0.004 * steps; };
+    // Buffers beyond the first cache cost something: of columns a whole strip stands in them.
+    const double per_step = lanes == 1 ? 0.1 : 0.004;
+    const auto step = [&](int steps) { return passes.of(steps).cost + per_step * steps; };
     const auto filled = [&](int count) { return static_cast<double>(packs_of(count, lanes)) * lanes / count; };
     for (int second = lanes; second <= length / lanes && second / 64 <= length / second; ++second) {
         const int first = length / second;

@@ -264,15 +264,25 @@ struct LaneFfts {
     // --- Transforms down the lanes
     // -------------------------------------------------------------------------------
 
-    /** Copies rows, and asks early for those that are too far apart for the processor to see them coming. */
+    /** Rows of an image: too far apart for the processor to see them coming, so that they are asked for early. */
+    static constexpr int kAhead = 12;
+    QUO_FFT_INLINE void ask(const float* row, std::ptrdiff_t floats) {
+        constexpr std::ptrdiff_t kLine = 16;
+        for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(row + k);
+    }
+    /** The first ones, while there is other work. */
+    static void ask_first(const float* row, std::ptrdiff_t step, int rows, std::ptrdiff_t floats) {
+        for (int k = 0; k < rows && k < kAhead; ++k, row += step) ask(row, floats);
+    }
+    /** Copies rows, of which those of the image are `ahead`. */
     static void move(const float* from, std::ptrdiff_t from_step, float* to, std::ptrdiff_t to_step, int rows,
                      std::ptrdiff_t floats) {
-        constexpr std::ptrdiff_t kAhead = 12, kLine = 16;
         constexpr std::ptrdiff_t kWhole = kStripPacks * kSlot;
-        for (int row = 0; row < rows; ++row, from += from_step, to += to_step) {
-            const float* const next = from + kAhead * from_step;
-            if (row + kAhead < rows)
-                for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(next + k);
+        const bool reads = from_step > to_step;
+        const float* image = reads ? from : to;
+        const std::ptrdiff_t step = reads ? from_step : to_step;
+        for (int row = 0; row < rows; ++row, from += from_step, to += to_step, image += step) {
+            if (row + kAhead < rows) ask(image + kAhead * step, floats);
             if (floats == kWhole)
                 std::memcpy(to, from, sizeof(float) * kWhole);
             else
@@ -288,7 +298,10 @@ struct LaneFfts {
         float *const work = room, *const stage = work + fft.work, *const tile = stage + fft.stage;
         const std::ptrdiff_t stage_step = packs * kSlot, tile_row = packs * fft.pitch * kSlot;
         for (int i = 0; i < n1; ++i) {
-            if (in.interleaved) move(in.at + i * in.step, n1 * in.step, stage, stage_step, n2, floats);
+            if (in.interleaved) {
+                move(in.at + i * in.step, n1 * in.step, stage, stage_step, n2, floats);
+                if (i + 1 < n1) ask_first(in.at + (i + 1) * in.step, n1 * in.step, n2, floats);
+            }
             for (int b = 0; b < packs; ++b) {
                 const From from = in.interleaved ? From{stage + b * kSlot, stage_step, true}
                                                  : From{in.at + i * in.step, n1 * in.step, false};
@@ -297,6 +310,7 @@ struct LaneFfts {
             }
         }
         for (int k = 0; k < n2; ++k) {
+            if (out.interleaved) ask_first(out.at + k * out.step, n2 * out.step, n1, floats);
             for (int b = 0; b < packs; ++b) {
                 const To to = out.interleaved ? To{stage + b * kSlot, stage_step, true}
                                               : To{out.at + k * out.step, n2 * out.step, false};
@@ -345,109 +359,6 @@ struct LaneFfts {
         return __builtin_shufflevector(
             a, b, (I / 4 * 4 + I % 4 / (2 * Run) + I % Run + (Upper ? 2 : 0) + I / Run % 2 * W)...);
     }
-    /** Of each `2 * H` lanes, the first vector's upper half changes places with the second's lower one. */
-    template <int H, bool Upper, std::size_t... I>
-    QUO_FFT_INLINE V exchange(V a, V b, std::index_sequence<I...> /*lanes*/) {
-        return __builtin_shufflevector(a, b, ((I & H) == 0 ? I + (Upper ? H : 0) : I - (Upper ? 0 : H) + W)...);
-    }
-    /** Vectors `H` apart meet. */
-    template <int H, int N>
-    QUO_FFT_INLINE void meet(V (&v)[N]) {
-        constexpr std::make_index_sequence<W> kLanes;
-        each<N>([&](auto i) QUO_FFT_HERE {
-            if constexpr ((i & H) == 0) {
-                const V a = v[i], b = v[i + H];
-                if constexpr (H < 4) {
-                    v[i] = weave<H, false>(a, b, kLanes);
-                    v[i + H] = weave<H, true>(a, b, kLanes);
-                } else {
-                    v[i] = exchange<H, false>(a, b, kLanes);
-                    v[i + H] = exchange<H, true>(a, b, kLanes);
-                }
-            }
-        });
-    }
-    /** Lanes become vectors and vectors lanes: squares of four by four first, for which there are fast
-     * instructions. */
-    QUO_FFT_INLINE void transpose(V (&v)[W]) {
-        meet<1>(v);
-        meet<2>(v);
-        each<W / 4>([&](auto i) QUO_FFT_HERE {
-            const V second = v[4 * i + 1];
-            v[4 * i + 1] = v[4 * i + 2];
-            v[4 * i + 2] = second;
-        });
-        if constexpr (W >= 8) meet<4>(v);
-        if constexpr (W >= 16) meet<8>(v);
-    }
-    /** W slots become W others, each by a function of its own: one part after the other. */
-    template <class Load, class Save>
-    QUO_FFT_INLINE void transpose_slots(const Load& load_one, const Save& save_one) {
-        C slots[W];
-        V part[W];
-        each<W>([&](auto i) QUO_FFT_HERE { slots[i] = load_one(i); });
-        each<W>([&](auto i) QUO_FFT_HERE { part[i] = slots[i].re; });
-        transpose(part);
-        each<W>([&](auto i) QUO_FFT_HERE { slots[i].re = part[i]; });
-        each<W>([&](auto i) QUO_FFT_HERE { part[i] = slots[i].im; });
-        transpose(part);
-        each<W>([&](auto i) QUO_FFT_HERE { save_one(i, C{slots[i].re, part[i]}); });
-    }
-
-    /** First of a pack's lanes: the last pack overlaps the one before it. */
-    QUO_FFT_INLINE int lane_of(int pack, int count) { return (pack + 1) * W <= count ? pack * W : count - W; }
-
-    /** W results of each transform of step 1 become the lanes of step 2. */
-    template <bool ByPack>
-    static void turn_pack(const RowFft& fft, const float* tile, int result, float* lanes) {
-        const int n1 = fft.second.length(), n2 = fft.first.length();
-        for (int b = 0; b * W < n1; ++b) {
-            const float* const slots = tile + (b * fft.pitch + result) * kSlot;
-            const FftRoot* const turns = fft.packs + std::ptrdiff_t{b} * n2 + result;
-            float* const to = lanes + lane_of(b, n1) * kSlot;
-            transpose_slots(
-                [&](auto i) QUO_FFT_HERE {
-                    const C c = load<false>(slots + i * kSlot);
-                    if constexpr (ByPack) return turn(c, turns[i]);
-                    return c;
-                },
-                [&](auto i, C c) QUO_FFT_HERE { save<false>(c, to + i * kSlot); });
-        }
-    }
-
-    /** Asks for samples of the next row while this one is at work. */
-    QUO_FFT_INLINE void fetch(const float* from, std::ptrdiff_t floats) {
-        constexpr std::ptrdiff_t kLine = 16;
-        for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(from + k);
-    }
-    static void rows(const RowFft& fft, const FftRows& rows, float* room) noexcept {
-        const int n1 = fft.second.length(), n2 = fft.first.length();
-        float *const tile = room, *const lanes = tile + fft.tile, *const rest = lanes + fft.lanes;
-        for (std::ptrdiff_t row = 0; row < rows.count; ++row) {
-            const float* const in = rows.in + row * rows.distance;
-            float* const out = rows.out + row * rows.distance;
-            for (int b = 0; b * W < n1; ++b)
-                one_pack(fft.first, {in + 2 * lane_of(b, n1), 2 * std::ptrdiff_t{n1}, true},
-                         {tile + b * fft.pitch * kSlot, kSlot, false},
-                         fft.turns + (fft.packs ? 0 : std::ptrdiff_t{b} * n2 * kSlot), rest);
-            for (int c = 0; c * W < n2; ++c) {
-                const int result = lane_of(c, n2);
-                (fft.packs ? turn_pack<true> : turn_pack<false>)(fft, tile, result, lanes);
-                one_pack(fft.second, {lanes, kSlot, false}, {out + 2 * result, 2 * std::ptrdiff_t{n2}, true},
-                         nullptr, rest);
-                if (row + 1 < rows.count) fetch(in + rows.distance + c * kSlot * n1, kSlot * n1);
-            }
-        }
-    }
-
-    // --- Short rows, one a lane
-    // ----------------------------------------------------------------------------------
-
-    /** Floats from row to row, and 1, or -1 for the backward transform: the conjugate one of the conjugate row. */
-    struct Gap {
-        std::ptrdiff_t step;
-        float sign;
-    };
     typedef float Four __attribute__((vector_size(16), aligned(4), may_alias));
     template <class A, std::size_t... I>
     QUO_FFT_INLINE auto concatenate(A a, A b, std::index_sequence<I...> /*lanes of both*/) {
@@ -466,14 +377,76 @@ struct LaneFfts {
     QUO_FFT_INLINE void save_four(V v, float* to, std::index_sequence<I...> /*lanes*/) {
         *reinterpret_cast<Four*>(to) = __builtin_shufflevector(v, v, (First + I)...);
     }
-    /** Every four lanes of four vectors become vectors of their own, and the other way round. */
+    /** Squares of four lanes of four vectors are turned: lane 4 c + i of vector j was lane 4 c + j of vector i. */
     QUO_FFT_INLINE void turn_fours(V (&v)[4]) {
-        meet<1>(v);
-        meet<2>(v);
-        const V second = v[1];
-        v[1] = v[2];
-        v[2] = second;
+        constexpr std::make_index_sequence<W> kLanes;
+        const V low = weave<1, false>(v[0], v[1], kLanes), high = weave<1, true>(v[0], v[1], kLanes);
+        const V next_low = weave<1, false>(v[2], v[3], kLanes), next_high = weave<1, true>(v[2], v[3], kLanes);
+        v[0] = weave<2, false>(low, next_low, kLanes);
+        v[1] = weave<2, true>(low, next_low, kLanes);
+        v[2] = weave<2, false>(high, next_high, kLanes);
+        v[3] = weave<2, true>(high, next_high, kLanes);
     }
+    /** Four vectors, whose squares are turned, become four floats each of W rows. */
+    QUO_FFT_INLINE void save_fours(V (&v)[4], float* to, std::ptrdiff_t step) {
+        turn_fours(v);
+        each<W>([&](auto row) QUO_FFT_HERE {
+            save_four<row / 4 * 4>(v[row % 4], to + row * step, std::make_index_sequence<4>{});
+        });
+    }
+    /** First of a pack's lanes: the last pack overlaps the one before it. */
+    QUO_FFT_INLINE int lane_of(int pack, int count) { return (pack + 1) * W <= count ? pack * W : count - W; }
+
+    /** W results of each transform of step 1 become the lanes of step 2. */
+    template <bool ByPack>
+    static void turn_pack(const RowFft& fft, const float* tile, int result, float* lanes) {
+        const int n1 = fft.second.length(), n2 = fft.first.length();
+        for (int b = 0; b * W < n1; ++b) {
+            const float* const slots = tile + (b * fft.pitch + result) * kSlot;
+            const FftRoot* const turns = fft.packs + std::ptrdiff_t{b} * n2 + result;
+            float* const to = lanes + lane_of(b, n1) * kSlot;
+            for (int k = 0; k < W; k += 4) {
+                V re[4], im[4];
+                each<4>([&](auto i) QUO_FFT_HERE {
+                    C c = load<false>(slots + (k + i) * kSlot);
+                    if constexpr (ByPack) c = turn(c, turns[k + i]);
+                    re[i] = c.re;
+                    im[i] = c.im;
+                });
+                save_fours(re, to + k, kSlot);
+                save_fours(im, to + k + W, kSlot);
+            }
+        }
+    }
+
+    static void rows(const RowFft& fft, const FftRows& rows, float* room) noexcept {
+        const int n1 = fft.second.length(), n2 = fft.first.length();
+        float *const tile = room, *const lanes = tile + fft.tile, *const rest = lanes + fft.lanes;
+        for (std::ptrdiff_t row = 0; row < rows.count; ++row) {
+            const float* const in = rows.in + row * rows.distance;
+            float* const out = rows.out + row * rows.distance;
+            for (int b = 0; b * W < n1; ++b)
+                one_pack(fft.first, {in + 2 * lane_of(b, n1), 2 * std::ptrdiff_t{n1}, true},
+                         {tile + b * fft.pitch * kSlot, kSlot, false},
+                         fft.turns + (fft.packs ? 0 : std::ptrdiff_t{b} * n2 * kSlot), rest);
+            for (int c = 0; c * W < n2; ++c) {
+                const int result = lane_of(c, n2);
+                (fft.packs ? turn_pack<true> : turn_pack<false>)(fft, tile, result, lanes);
+                one_pack(fft.second, {lanes, kSlot, false}, {out + 2 * result, 2 * std::ptrdiff_t{n2}, true},
+                         nullptr, rest);
+                if (row + 1 < rows.count) ask(in + rows.distance + c * kSlot * n1, kSlot * n1);
+            }
+        }
+    }
+
+    // --- Short rows, one a lane
+    // ----------------------------------------------------------------------------------
+
+    /** Floats from row to row, and 1, or -1 for the backward transform: the conjugate one of the conjugate row. */
+    struct Gap {
+        std::ptrdiff_t step;
+        float sign;
+    };
     /** Two neighbouring samples of W rows, their imaginary parts times `sign`. */
     QUO_FFT_INLINE void load_two(const float* from, const Gap& gap, C& first, C& second) {
         V v[4];
@@ -484,10 +457,7 @@ struct LaneFfts {
     }
     QUO_FFT_INLINE void save_two(C first, C second, float* to, const Gap& gap) {
         V v[4] = {first.re, first.im * gap.sign, second.re, second.im * gap.sign};
-        turn_fours(v);
-        each<W>([&](auto row) QUO_FFT_HERE {
-            save_four<row / 4 * 4>(v[row % 4], to + row * gap.step, std::make_index_sequence<4>{});
-        });
+        save_fours(v, to, gap.step);
     }
     /** First of two neighbours: at an odd end the last two overlap those before. */
     static constexpr int pair_of(int i, int count) { return i + 2 > count ? count - 2 : i; }
