@@ -274,7 +274,7 @@ struct LaneFfts {
     static void ask_first(const float* row, std::ptrdiff_t step, int rows, std::ptrdiff_t floats) {
         for (int k = 0; k < rows && k < kAhead; ++k, row += step) ask(row, floats);
     }
-    /** Copies rows, of which those of the image are `ahead`. */
+    /** Copies rows from an image to a stage or back; the stage's are closer together. */
     static void move(const float* from, std::ptrdiff_t from_step, float* to, std::ptrdiff_t to_step, int rows,
                      std::ptrdiff_t floats) {
         constexpr std::ptrdiff_t kWhole = kStripPacks * kSlot;
