@@ -20,7 +20,7 @@ struct RadixCost {
     int radix;
     double cost;
 };
-constexpr RadixCost kRadixCosts[] = {{16, 30.0}, {15, 42.0}, {14, 42.0}, {12, 28.0}, {10, 26.0},
+constexpr RadixCost kRadixCosts[] = {{16, 30.0}, {15, 38.0}, {14, 42.0}, {12, 28.0}, {10, 26.0},
                                      {9, 27.0},  {8, 21.0},  {7, 27.0},  {6, 21.0},  {5, 21.0},
                                      {4, 17.0},  {3, 18.0},  {2, 15.0}};
 /** Exchanging lanes and slots. */
