@@ -264,8 +264,9 @@ struct LaneFfts {
     // --- Transforms down the lanes
     // -------------------------------------------------------------------------------
 
-    /** Rows of an image: too far apart for the processor to see them coming, so that they are asked for early. */
-    static constexpr int kAhead = 12;
+    /** Rows of an image: too far apart for the processor to see them coming, so that they are asked for early.
+     * More of them, a power of two apart, would push each other out of the first caches. */
+    static constexpr int kAhead = 6;
     QUO_FFT_INLINE void ask(const float* row, std::ptrdiff_t floats) {
         constexpr std::ptrdiff_t kLine = 16;
         for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(row + k);
