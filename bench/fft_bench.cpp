@@ -52,6 +52,11 @@ constexpr Job kJobs[] = {{"rows_1024", 1024, 1024, true, false, 1.4},
                          {"rows_5760", 5760, 1080, true, false},
                          {"columns_5760", 1080, 5760, false, true, 1.5},
                          {"wide_columns_1080", 5760, 1080, false, true},
+                         {"rows_2", 2, 16384, true, false},
+                         {"rows_16", 16, 4096, true, false},
+                         {"rows_64", 64, 1024, true, false},
+                         {"rows_320", 320, 256, true, false},
+                         {"rows_400", 400, 256, true, false},
                          {"rows_4099", 4099, 256, true, false, 0.95, "fftw"},
                          {"columns_4099", 256, 4099, false, true, 0.95, "fftw"}};
 

@@ -153,6 +153,21 @@ TEST(OwnFft, EveryWidthOfVectorMeetsTheTruth) {
                 }
 }
 
+// How rows are grouped must not show: not in the last few of a block, nor in one alone.
+TEST(OwnFft, ARowHasTheBitsAloneThatItHasAmongOthers) {
+    const Engine engine{"quo"};
+    for (const int n : {2, 5, 14, 30, 75, 256, 378, 640, 1080, 4096}) {
+        constexpr int kRows = 37;
+        const auto length = static_cast<std::size_t>(n);
+        Samples rows = test::noise(length * kRows), alone(rows.begin(), rows.begin() + n);
+        std::copy(alone.begin(), alone.end(), rows.end() - n);
+        ASSERT_EQ(fft_c(n, n, 1, 1, -2, 0, alone.data(), alone.data()), 0);
+        ASSERT_EQ(fft_c(n, n, kRows, kRows, -2, 0, rows.data(), rows.data()), 0);
+        EXPECT_TRUE(std::equal(alone.begin(), alone.end(), rows.begin())) << n;
+        EXPECT_TRUE(std::equal(alone.begin(), alone.end(), rows.end() - n)) << n;
+    }
+}
+
 /** Counts what is made of it; makes batches that do nothing. */
 struct CountingEngine final : quo::FftEngine {
     struct Batch final : quo::FftBatch {

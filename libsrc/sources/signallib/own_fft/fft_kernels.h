@@ -26,11 +26,9 @@ struct FftPass {
 struct ShortFft {
     static constexpr int kMostPasses = 16;
     int length = 1;
-    int together = 1;  ///< so many transforms, whose samples take turns
     int passes = 0;
     FftPass pass[kMostPasses] = {};
-    bool reverse =
-        false;  ///< read backwards (0, length - 1, ..., 1), which gives the backward transform; one only
+    bool backward = false;
 };
 
 /** A transform down the lanes, in one step, or in two of about the square root of its length each: step 1 over
@@ -38,8 +36,6 @@ struct ShortFft {
  * neighbours. */
 struct LaneFft {
     ShortFft first, second;  ///< the second has no passes where one step is enough
-    int packs = 1;           ///< of short rows that are transformed together
-    bool mirror = false;     ///< short rows are read backwards on their way into the lanes
     const FftRoot* outer = nullptr;
     std::ptrdiff_t pitch = 0;                      ///< slots from one transform of step 2 to the next
     std::ptrdiff_t tile = 0, stage = 0, work = 0;  ///< floats of room
@@ -85,9 +81,6 @@ struct FftKernels {
 
 /** Packs of lanes that columns are moved in together. */
 inline constexpr int kStripPacks = 2;
-
-/** Most packs of short rows that are transformed together. */
-inline constexpr int kMostShortPacks = 16;
 
 /** The kernels for so many lanes: 4, 8 or 16; null where they were not built or this processor does not run them.
  */

@@ -20,14 +20,17 @@ struct RadixCost {
     int radix;
     double cost;
 };
-constexpr RadixCost kRadixCosts[] = {{16, 30.0}, {10, 26.0}, {9, 27.0}, {8, 21.0}, {7, 27.0},
-                                     {6, 21.0},  {5, 21.0},  {4, 17.0}, {3, 18.0}, {2, 15.0}};
-/** Exchanging lanes and slots, and the same sample by sample. */
-constexpr double kTransposeCost = 20.0, kSampleCost = 60.0;
+constexpr RadixCost kRadixCosts[] = {{16, 30.0}, {15, 38.0}, {14, 42.0}, {12, 28.0}, {10, 26.0},
+                                     {9, 27.0},  {8, 21.0},  {7, 27.0},  {6, 21.0},  {5, 21.0},
+                                     {4, 17.0},  {3, 18.0},  {2, 15.0}};
+/** Exchanging lanes and slots. */
+constexpr double kTransposeCost = 20.0;
 /** Lengths up to this one are transformed in one step, whose buffers the first cache holds. */
 constexpr int kOneStep = 128;
-/** Longer short rows would leave the second cache. */
-constexpr int kLongestShortRow = 1024;
+/** More would not make short rows faster: loads and stores of their samples take most of the time. */
+constexpr int kShortRowLanes = 8;
+/** Short rows up to this length, eight at a time, leave room in the first cache. */
+constexpr int kCachedShortRow = 256;
 /** Rows whose turns are kept for one pack of lanes only. */
 constexpr int kLongRow = 1 << 16;
 
@@ -68,8 +71,9 @@ int packs_of(int count, int lanes) { return count / lanes + (count % lanes != 0 
  * packs of one. The cost is that of one value. */
 Split split(PassChoice& passes, int length, int lanes) {
     Split best;
-    // Buffers beyond the first cache cost something.
-    const auto step = [&](int steps) { return passes.of(steps).cost + 0.004 * steps; };
+    // Buffers beyond the first cache cost something: of columns a whole strip stands in them.
+    const double per_step = lanes == 1 ? 0.1 : 0.004;
+    const auto step = [&](int steps) { return passes.of(steps).cost + per_step * steps; };
     const auto filled = [&](int count) { return static_cast<double>(packs_of(count, lanes)) * lanes / count; };
     for (int second = lanes; second <= length / lanes && second / 64 <= length / second; ++second) {
         const int first = length / second;
@@ -80,10 +84,9 @@ Split split(PassChoice& passes, int length, int lanes) {
     return best;
 }
 
-double short_rows_cost(PassChoice& passes, int length, int lanes) {
-    if (length > kLongestShortRow) return std::numeric_limits<double>::infinity();
-    const double moves = length < lanes ? kSampleCost : kTransposeCost * packs_of(length, lanes) * lanes / length;
-    return (passes.of(length).cost + 2.0 * moves) * length;
+/** The same of rows that stand in one lane each: they take no turns. */
+double short_rows_cost(PassChoice& passes, int length) {
+    return passes.of(length).cost + 0.05 * std::max(length - kCachedShortRow, 0);
 }
 
 /** What an operation takes on a vector of so many lanes. */
@@ -157,21 +160,22 @@ FftKind choose_fft(const FftGeometry& geometry, int widest) {
     FftKind best;
     double least = std::numeric_limits<double>::infinity();
     const auto offer = [&](FftWay way, int lanes, double cost) {
-        cost *= lane_weight(lanes);
+        cost *= lane_weight(lanes) / lanes;
         if (cost < least) best = {way, geometry.length, geometry.forward, lanes};
         least = std::min(least, cost);
     };
     for (const int lanes : {16, 8, 4}) {
         if (lanes > widest || !fft_kernels(lanes)) continue;
-        const double packs = packs_of(geometry.count, lanes);
         if (geometry.stride != 1) {
-            offer(FftWay::Columns, lanes, packs);
-        } else {
-            offer(FftWay::Rows, lanes,
-                  split(passes, geometry.length, lanes).cost * geometry.length * geometry.count / lanes);
-            offer(FftWay::ShortRows, lanes, packs * short_rows_cost(passes, geometry.length, lanes));
+            offer(FftWay::Columns, lanes, lanes * packs_of(geometry.count, lanes));
+            continue;
         }
+        // The number of rows must not matter: a row has the same bits among others as alone.
+        offer(FftWay::Rows, lanes, split(passes, geometry.length, lanes).cost);
+        if (lanes <= kShortRowLanes) offer(FftWay::ShortRows, lanes, short_rows_cost(passes, geometry.length));
     }
+    // Short rows have the same bits in lanes of any number.
+    if (best.way == FftWay::ShortRows && geometry.count <= 4) best.lanes = 4;
     return best;
 }
 
@@ -188,7 +192,7 @@ FftTables::FftTables(const FftKind& kind) : kind_{kind}, kernels_{fft_kernels(ki
     if (kind.way == FftWay::Rows)
         row_ = along_row();
     else
-        lanes_ = down_lanes(kind.length, kind.way == FftWay::Columns ? kStripPacks : 0);
+        lanes_ = down_lanes(kind.length, kStripPacks);
 }
 
 std::size_t FftTables::room() const noexcept {
@@ -211,38 +215,35 @@ void FftTables::run(const float* in, float* out, std::ptrdiff_t pitch, int count
 
 const FftRoot* FftTables::keep(std::vector<FftRoot> roots) { return roots_.emplace_back(std::move(roots)).data(); }
 
-ShortFft FftTables::take_apart(int length, int together) {
+ShortFft FftTables::take_apart(int length) {
     ShortFft fft;
     fft.length = length;
-    fft.together = together;
-    fft.reverse = !kind_.forward && kind_.way != FftWay::ShortRows;
+    fft.backward = !kind_.forward;
     PassChoice passes;
     int left = length;
     for (const int radix : passes.of(length).radices) {
         const int count = left / radix;
         const FftRoot* const roots = count > 1 ? keep(root_table(left, true, count, radix, 1)) : nullptr;
-        fft.pass[fft.passes++] = {radix, count, length / left * together, roots};
+        fft.pass[fft.passes++] = {radix, count, length / left, roots};
         left = count;
     }
-    if (fft.passes == 0) fft.pass[fft.passes++] = {1, 1, together, nullptr};  // one sample is its own transform
+    if (fft.passes == 0) fft.pass[fft.passes++] = {1, 1, 1, nullptr};  // one sample is its own transform
     return fft;
 }
 
 LaneFft FftTables::down_lanes(int length, int packs) {
     LaneFft fft;
     const std::ptrdiff_t slot = 2 * std::ptrdiff_t{kind_.lanes};
-    if (length <= kOneStep || packs == 0) {
-        if (packs == 0) fft.packs = std::clamp(kOneStep / length, 1, kMostShortPacks);
-        fft.mirror = !kind_.forward;
-        fft.first = take_apart(length, fft.packs);
-        fft.stage = length * fft.packs * slot;
+    if (length <= kOneStep || kind_.way == FftWay::ShortRows) {
+        fft.first = take_apart(length);
+        fft.stage = length * slot;
         fft.work = 2 * fft.stage;
         return fft;
     }
     PassChoice passes;
     const int second = split(passes, length, 1).second, first = length / second;
-    fft.first = take_apart(first, 1);
-    fft.second = take_apart(second, 1);
+    fft.first = take_apart(first);
+    fft.second = take_apart(second);
     fft.outer = keep(root_table(length, kind_.forward, second, first));
     fft.pitch = second | 1;  // an even one would have slots share a few lines of the cache
     fft.work = 2 * std::max(first, second) * slot;

@@ -48,7 +48,7 @@ public:
 
 private:
     [[nodiscard]] const FftRoot* keep(std::vector<FftRoot> roots);
-    [[nodiscard]] ShortFft take_apart(int length, int together);
+    [[nodiscard]] ShortFft take_apart(int length);
     [[nodiscard]] LaneFft down_lanes(int length, int packs);
     [[nodiscard]] RowFft along_row();
     void turn_lanes(RowFft& row);

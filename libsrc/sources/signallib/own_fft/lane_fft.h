@@ -1,6 +1,7 @@
 #ifndef QUO_LANE_FFT_H
 #define QUO_LANE_FFT_H
 
+#include <array>
 #include <cstddef>
 #include <cstring>
 #include <utility>
@@ -97,7 +98,7 @@ struct LaneFfts {
         each_of(std::make_index_sequence<N>{}, body);
     }
     static constexpr int inner_radix(int radix) {
-        return radix % 4 == 0 && radix > 4 ? 4 : radix % 2 == 0 ? radix / 2 : radix == 9 ? 3 : radix;
+        return radix % 4 == 0 && radix > 4 ? 4 : radix % 2 == 0 ? radix / 2 : radix % 3 == 0 ? 3 : radix;
     }
 
     /** The transform of R values, in natural order. */
@@ -199,6 +200,7 @@ struct LaneFfts {
     }
 
     using PassKernel = void (*)(const FftPass&, const Route&);
+    using Radices = std::integer_sequence<int, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 12, 14, 15, 16>;
     static constexpr int kRadices = 17;
     struct PassTable {
         PassKernel of[kRadices];
@@ -211,8 +213,7 @@ struct LaneFfts {
     }
     template <bool InInterleaved, bool OutInterleaved, Turns T>
     static PassKernel find(int radix) {
-        static constexpr PassTable kTable = passes_of<InInterleaved, OutInterleaved, T>(
-            std::integer_sequence<int, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 16>{});
+        static constexpr PassTable kTable = passes_of<InInterleaved, OutInterleaved, T>(Radices{});
         return kTable.of[radix];
     }
 
@@ -241,7 +242,7 @@ struct LaneFfts {
     /** `work` holds the transform twice. */
     static void run(const ShortFft& fft, From in, To out, Outer outer, float* work) {
         Route route{in.at, in.at, work, in.step, kSlot, outer.roots, outer.lanes};
-        if (fft.reverse) {
+        if (fft.backward) {
             route.in += fft.length * in.step;
             route.in_step = -in.step;
         }
@@ -252,7 +253,7 @@ struct LaneFfts {
             (interleaved ? find<true, false, kInner>(pass.radix) : find<false, false, kInner>(pass.radix))(pass,
                                                                                                            route);
             interleaved = false;
-            float* const next = route.out == work ? work + fft.length * fft.together * kSlot : work;
+            float* const next = route.out == work ? work + fft.length * kSlot : work;
             route = {route.out, route.out, next, kSlot, kSlot, outer.roots, outer.lanes};
         }
         route.out = out.at;
@@ -263,15 +264,26 @@ struct LaneFfts {
     // --- Transforms down the lanes
     // -------------------------------------------------------------------------------
 
-    /** Copies rows, and asks early for those that are too far apart for the processor to see them coming. */
+    /** Rows of an image: too far apart for the processor to see them coming, so that they are asked for early.
+     * More of them, a power of two apart, would push each other out of the first caches. */
+    static constexpr int kAhead = 6;
+    QUO_FFT_INLINE void ask(const float* row, std::ptrdiff_t floats) {
+        constexpr std::ptrdiff_t kLine = 16;
+        for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(row + k);
+    }
+    /** The first ones, while there is other work. */
+    static void ask_first(const float* row, std::ptrdiff_t step, int rows, std::ptrdiff_t floats) {
+        for (int k = 0; k < rows && k < kAhead; ++k, row += step) ask(row, floats);
+    }
+    /** Copies rows from an image to a stage or back; the stage's are closer together. */
     static void move(const float* from, std::ptrdiff_t from_step, float* to, std::ptrdiff_t to_step, int rows,
                      std::ptrdiff_t floats) {
-        constexpr std::ptrdiff_t kAhead = 12, kLine = 16;
         constexpr std::ptrdiff_t kWhole = kStripPacks * kSlot;
-        for (int row = 0; row < rows; ++row, from += from_step, to += to_step) {
-            const float* const next = from + kAhead * from_step;
-            if (row + kAhead < rows)
-                for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(next + k);
+        const bool reads = from_step > to_step;
+        const float* image = reads ? from : to;
+        const std::ptrdiff_t step = reads ? from_step : to_step;
+        for (int row = 0; row < rows; ++row, from += from_step, to += to_step, image += step) {
+            if (row + kAhead < rows) ask(image + kAhead * step, floats);
             if (floats == kWhole)
                 std::memcpy(to, from, sizeof(float) * kWhole);
             else
@@ -287,7 +299,10 @@ struct LaneFfts {
         float *const work = room, *const stage = work + fft.work, *const tile = stage + fft.stage;
         const std::ptrdiff_t stage_step = packs * kSlot, tile_row = packs * fft.pitch * kSlot;
         for (int i = 0; i < n1; ++i) {
-            if (in.interleaved) move(in.at + i * in.step, n1 * in.step, stage, stage_step, n2, floats);
+            if (in.interleaved) {
+                move(in.at + i * in.step, n1 * in.step, stage, stage_step, n2, floats);
+                if (i + 1 < n1) ask_first(in.at + (i + 1) * in.step, n1 * in.step, n2, floats);
+            }
             for (int b = 0; b < packs; ++b) {
                 const From from = in.interleaved ? From{stage + b * kSlot, stage_step, true}
                                                  : From{in.at + i * in.step, n1 * in.step, false};
@@ -296,6 +311,7 @@ struct LaneFfts {
             }
         }
         for (int k = 0; k < n2; ++k) {
+            if (out.interleaved) ask_first(out.at + k * out.step, n2 * out.step, n1, floats);
             for (int b = 0; b < packs; ++b) {
                 const To to = out.interleaved ? To{stage + b * kSlot, stage_step, true}
                                               : To{out.at + k * out.step, n2 * out.step, false};
@@ -344,55 +360,41 @@ struct LaneFfts {
         return __builtin_shufflevector(
             a, b, (I / 4 * 4 + I % 4 / (2 * Run) + I % Run + (Upper ? 2 : 0) + I / Run % 2 * W)...);
     }
-    /** Of each `2 * H` lanes, the first vector's upper half changes places with the second's lower one. */
-    template <int H, bool Upper, std::size_t... I>
-    QUO_FFT_INLINE V exchange(V a, V b, std::index_sequence<I...> /*lanes*/) {
-        return __builtin_shufflevector(a, b, ((I & H) == 0 ? I + (Upper ? H : 0) : I - (Upper ? 0 : H) + W)...);
+    typedef float Four __attribute__((vector_size(16), aligned(4), may_alias));
+    template <class A, std::size_t... I>
+    QUO_FFT_INLINE auto concatenate(A a, A b, std::index_sequence<I...> /*lanes of both*/) {
+        return __builtin_shufflevector(a, b, I...);
     }
-    /** Vectors `H` apart meet. */
-    template <int H>
-    QUO_FFT_INLINE void meet(V (&v)[W]) {
+    /** Four floats each of N rows. */
+    template <int N>
+    QUO_FFT_INLINE auto fours(const float* from, std::ptrdiff_t step) {
+        if constexpr (N == 1)
+            return *reinterpret_cast<const Four*>(from);
+        else
+            return concatenate(fours<N / 2>(from, step), fours<N / 2>(from + N / 2 * step, step),
+                               std::make_index_sequence<4 * N>{});
+    }
+    template <int First, std::size_t... I>
+    QUO_FFT_INLINE void save_four(V v, float* to, std::index_sequence<I...> /*lanes*/) {
+        *reinterpret_cast<Four*>(to) = __builtin_shufflevector(v, v, (First + I)...);
+    }
+    /** Squares of four lanes of four vectors are turned: lane 4 c + i of vector j was lane 4 c + j of vector i. */
+    QUO_FFT_INLINE void turn_fours(V (&v)[4]) {
         constexpr std::make_index_sequence<W> kLanes;
-        each<W>([&](auto i) QUO_FFT_HERE {
-            if constexpr ((i & H) == 0) {
-                const V a = v[i], b = v[i + H];
-                if constexpr (H < 4) {
-                    v[i] = weave<H, false>(a, b, kLanes);
-                    v[i + H] = weave<H, true>(a, b, kLanes);
-                } else {
-                    v[i] = exchange<H, false>(a, b, kLanes);
-                    v[i + H] = exchange<H, true>(a, b, kLanes);
-                }
-            }
+        const V low = weave<1, false>(v[0], v[1], kLanes), high = weave<1, true>(v[0], v[1], kLanes);
+        const V next_low = weave<1, false>(v[2], v[3], kLanes), next_high = weave<1, true>(v[2], v[3], kLanes);
+        v[0] = weave<2, false>(low, next_low, kLanes);
+        v[1] = weave<2, true>(low, next_low, kLanes);
+        v[2] = weave<2, false>(high, next_high, kLanes);
+        v[3] = weave<2, true>(high, next_high, kLanes);
+    }
+    /** Four vectors, whose squares are turned, become four floats each of W rows. */
+    QUO_FFT_INLINE void save_fours(V (&v)[4], float* to, std::ptrdiff_t step) {
+        turn_fours(v);
+        each<W>([&](auto row) QUO_FFT_HERE {
+            save_four<row / 4 * 4>(v[row % 4], to + row * step, std::make_index_sequence<4>{});
         });
     }
-    /** Lanes become vectors and vectors lanes: squares of four by four first, for which there are fast
-     * instructions. */
-    QUO_FFT_INLINE void transpose(V (&v)[W]) {
-        meet<1>(v);
-        meet<2>(v);
-        each<W / 4>([&](auto i) QUO_FFT_HERE {
-            const V second = v[4 * i + 1];
-            v[4 * i + 1] = v[4 * i + 2];
-            v[4 * i + 2] = second;
-        });
-        if constexpr (W >= 8) meet<4>(v);
-        if constexpr (W >= 16) meet<8>(v);
-    }
-    /** W slots become W others, each by a function of its own: one part after the other. */
-    template <class Load, class Save>
-    QUO_FFT_INLINE void transpose_slots(const Load& load_one, const Save& save_one) {
-        C slots[W];
-        V part[W];
-        each<W>([&](auto i) QUO_FFT_HERE { slots[i] = load_one(i); });
-        each<W>([&](auto i) QUO_FFT_HERE { part[i] = slots[i].re; });
-        transpose(part);
-        each<W>([&](auto i) QUO_FFT_HERE { slots[i].re = part[i]; });
-        each<W>([&](auto i) QUO_FFT_HERE { part[i] = slots[i].im; });
-        transpose(part);
-        each<W>([&](auto i) QUO_FFT_HERE { save_one(i, C{slots[i].re, part[i]}); });
-    }
-
     /** First of a pack's lanes: the last pack overlaps the one before it. */
     QUO_FFT_INLINE int lane_of(int pack, int count) { return (pack + 1) * W <= count ? pack * W : count - W; }
 
@@ -404,21 +406,20 @@ struct LaneFfts {
             const float* const slots = tile + (b * fft.pitch + result) * kSlot;
             const FftRoot* const turns = fft.packs + std::ptrdiff_t{b} * n2 + result;
             float* const to = lanes + lane_of(b, n1) * kSlot;
-            transpose_slots(
-                [&](auto i) QUO_FFT_HERE {
-                    const C c = load<false>(slots + i * kSlot);
-                    if constexpr (ByPack) return turn(c, turns[i]);
-                    return c;
-                },
-                [&](auto i, C c) QUO_FFT_HERE { save<false>(c, to + i * kSlot); });
+            for (int k = 0; k < W; k += 4) {
+                V re[4], im[4];
+                each<4>([&](auto i) QUO_FFT_HERE {
+                    C c = load<false>(slots + (k + i) * kSlot);
+                    if constexpr (ByPack) c = turn(c, turns[k + i]);
+                    re[i] = c.re;
+                    im[i] = c.im;
+                });
+                save_fours(re, to + k, kSlot);
+                save_fours(im, to + k + W, kSlot);
+            }
         }
     }
 
-    /** Asks for samples of the next row while this one is at work. */
-    QUO_FFT_INLINE void fetch(const float* from, std::ptrdiff_t floats) {
-        constexpr std::ptrdiff_t kLine = 16;
-        for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(from + k);
-    }
     static void rows(const RowFft& fft, const FftRows& rows, float* room) noexcept {
         const int n1 = fft.second.length(), n2 = fft.first.length();
         float *const tile = room, *const lanes = tile + fft.tile, *const rest = lanes + fft.lanes;
@@ -434,7 +435,7 @@ struct LaneFfts {
                 (fft.packs ? turn_pack<true> : turn_pack<false>)(fft, tile, result, lanes);
                 one_pack(fft.second, {lanes, kSlot, false}, {out + 2 * result, 2 * std::ptrdiff_t{n2}, true},
                          nullptr, rest);
-                if (row + 1 < rows.count) fetch(in + rows.distance + c * kSlot * n1, kSlot * n1);
+                if (row + 1 < rows.count) ask(in + rows.distance + c * kSlot * n1, kSlot * n1);
             }
         }
     }
@@ -442,63 +443,119 @@ struct LaneFfts {
     // --- Short rows, one a lane
     // ----------------------------------------------------------------------------------
 
-    /** Where sample `i` of a pack stands. */
-    QUO_FFT_INLINE std::ptrdiff_t slot_of(const LaneFft& fft, int pack, int i, bool mirror) {
-        return (std::ptrdiff_t{mirror && i > 0 ? fft.first.length - i : i} * fft.packs + pack) * kSlot;
+    /** Floats from row to row, and 1, or -1 for the backward transform: the conjugate one of the conjugate row. */
+    struct Gap {
+        std::ptrdiff_t step;
+        float sign;
+    };
+    /** Two neighbouring samples of W rows, their imaginary parts times `sign`. */
+    QUO_FFT_INLINE void load_two(const float* from, const Gap& gap, C& first, C& second) {
+        V v[4];
+        each<4>([&](auto k) QUO_FFT_HERE { v[k] = fours<W / 4>(from + k * gap.step, 4 * gap.step); });
+        turn_fours(v);
+        first = {v[0], v[1] * gap.sign};
+        second = {v[2], v[3] * gap.sign};
     }
-    /** Row by row, for those that are shorter than a vector. */
-    template <class Move>
-    QUO_FFT_INLINE void each_sample(const LaneFft& fft, int pack, bool mirror, const FftRows& rows,
-                                    const Move& move_one) {
-        for (int i = 0; i < fft.first.length; ++i)
-            for (int r = 0; r < rows.count; ++r)
-                move_one(slot_of(fft, pack, i, mirror) + r, r * rows.distance + 2 * i);
+    QUO_FFT_INLINE void save_two(C first, C second, float* to, const Gap& gap) {
+        V v[4] = {first.re, first.im * gap.sign, second.re, second.im * gap.sign};
+        save_fours(v, to, gap.step);
     }
-    static void into_lanes(const LaneFft& fft, int pack, const FftRows& rows, float* lanes) {
-        if (fft.first.length < W)
-            return each_sample(fft, pack, fft.mirror, rows, [&](auto lane, auto sample) QUO_FFT_HERE {
-                lanes[lane] = rows.in[sample];
-                lanes[lane + W] = rows.in[sample + 1];
-            });
-        for (int b = 0; b * W < fft.first.length; ++b) {
-            const int first = lane_of(b, fft.first.length);
-            transpose_slots(
-                [&](auto r) QUO_FFT_HERE {
-                    return load<true>(rows.in + (r < rows.count ? r : 0) * rows.distance + 2 * first);
-                },
-                [&](auto i, C c)
-                    QUO_FFT_HERE { save<false>(c, lanes + slot_of(fft, pack, first + i, fft.mirror)); });
+    /** First of two neighbours: at an odd end the last two overlap those before. */
+    static constexpr int pair_of(int i, int count) { return i + 2 > count ? count - 2 : i; }
+
+    /** `packs` times W rows whose samples registers hold. */
+    template <int N>
+    static void tiny_rows(const float* in, float* out, const Gap& gap, int packs) {
+        for (int pack = 0; pack < packs; ++pack, in += W * gap.step, out += W * gap.step) {
+            if constexpr (N == 1) {
+                each<W>([&](auto row) QUO_FFT_HERE {
+                    std::memcpy(out + row * gap.step, in + row * gap.step, sizeof(FftRoot));
+                });
+            } else {
+                C x[N];
+                each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
+                    constexpr int at = pair_of(2 * i, N);
+                    load_two(in + 2 * at, gap, x[at], x[at + 1]);
+                });
+                butterfly<N>(x);
+                each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
+                    constexpr int at = pair_of(2 * i, N);
+                    save_two(x[at], x[at + 1], out + 2 * at, gap);
+                });
+            }
         }
     }
-    static void out_of_lanes(const LaneFft& fft, int pack, const float* lanes, const FftRows& rows) {
-        if (fft.first.length < W)
-            return each_sample(fft, pack, false, rows, [&](auto lane, auto sample) QUO_FFT_HERE {
-                rows.out[sample] = lanes[lane];
-                rows.out[sample + 1] = lanes[lane + W];
+    /** The first pass over W rows, which become slots. */
+    template <int R>
+    static void pass_in(const FftPass& pass, const float* in, float* out, const Gap& gap) {
+        for (int p = 0; p < pass.count; p += 2) {
+            const int at = pair_of(p, pass.count);
+            C x[2][R];
+            each<R>([&](auto j) QUO_FFT_HERE { load_two(in + 2 * (at + j * pass.count), gap, x[0][j], x[1][j]); });
+            each<2>([&](auto i) QUO_FFT_HERE {
+                const FftRoot* const roots = pass.roots + (at + i) * (R - 1);
+                float* const to = out + (at + i) * R * kSlot;
+                butterfly<R>(x[i]);
+                save<false>(x[i][0], to);
+                each<R - 1>([&](auto k)
+                                QUO_FFT_HERE { save<false>(turn(x[i][k + 1], roots[k]), to + (k + 1) * kSlot); });
             });
-        for (int b = 0; b * W < fft.first.length; ++b) {
-            const int first = lane_of(b, fft.first.length);
-            transpose_slots([&](auto i)
-                                QUO_FFT_HERE { return load<false>(lanes + slot_of(fft, pack, first + i, false)); },
-                            [&](auto r, C c) QUO_FFT_HERE {
-                                if (r < rows.count) save<true>(c, rows.out + r * rows.distance + 2 * first);
-                            });
+        }
+    }
+    /** The last pass, whose slots become rows. */
+    template <int R>
+    static void pass_out(const FftPass& pass, const float* in, float* out, const Gap& gap) {
+        for (int q = 0; q < pass.stride; q += 2) {
+            const int at = pair_of(q, pass.stride);
+            C x[2][R];
+            each<2>([&](auto i) QUO_FFT_HERE {
+                each<R>([&](auto j)
+                            QUO_FFT_HERE { x[i][j] = load<false>(in + (at + i + j * pass.stride) * kSlot); });
+                butterfly<R>(x[i]);
+            });
+            each<R>([&](auto k)
+                        QUO_FFT_HERE { save_two(x[0][k], x[1][k], out + 2 * (at + k * pass.stride), gap); });
+        }
+    }
+    struct RowKernels {
+        void (*tiny)(const float*, float*, const Gap&, int);
+        void (*in)(const FftPass&, const float*, float*, const Gap&);
+        void (*out)(const FftPass&, const float*, float*, const Gap&);
+    };
+    template <int... R>
+    static constexpr std::array<RowKernels, kRadices> row_kernels(std::integer_sequence<int, R...> /*radices*/) {
+        std::array<RowKernels, kRadices> table{};
+        ((table[R] = {tiny_rows<R>, pass_in<R>, pass_out<R>}), ...);
+        return table;
+    }
+    /** `packs` times W rows. */
+    static void row_packs(const ShortFft& fft, FftRows rows, const Gap& gap, int packs, float* work) {
+        static constexpr auto kKernels = row_kernels(Radices{});
+        const FftPass &first = fft.pass[0], &last = fft.pass[fft.passes - 1];
+        if (fft.passes == 1) return kKernels[first.radix].tiny(rows.in, rows.out, gap, packs);
+        for (; packs > 0; --packs, rows.in += W * gap.step, rows.out += W * gap.step) {
+            float *now = work, *next = work + fft.length * kSlot;
+            kKernels[first.radix].in(first, rows.in, now, gap);
+            for (int k = 1; k < fft.passes - 1; ++k, std::swap(now, next))
+                find<false, false, kInner>(fft.pass[k].radix)(fft.pass[k],
+                                                              {now, now, next, kSlot, kSlot, nullptr, nullptr});
+            kKernels[last.radix].out(last, now, rows.out, gap);
         }
     }
     static void short_rows(const LaneFft& fft, const FftRows& rows, float* room) noexcept {
-        float* const lanes = room + fft.work;
-        for (int row = 0; row < rows.count;) {
-            FftRows pack[kMostShortPacks];
-            int packs = 0;
-            for (; packs < fft.packs && row < rows.count; ++packs, row += W) {
-                const std::ptrdiff_t offset = row * rows.distance;
-                pack[packs] = {rows.in + offset, rows.out + offset, rows.distance,
-                               rows.count - row < W ? rows.count - row : W};
-                into_lanes(fft, packs, pack[packs], lanes);
-            }
-            run(fft.first, {lanes, kSlot, false}, {lanes, kSlot, false}, {}, room);
-            for (int b = 0; b < packs; ++b) out_of_lanes(fft, b, lanes, pack[b]);
-        }
+        const std::ptrdiff_t floats = 2 * std::ptrdiff_t{fft.first.length}, step = rows.distance;
+        const std::size_t bytes = sizeof(float) * static_cast<std::size_t>(floats);
+        const float sign = fft.first.backward ? -1.0F : 1.0F;
+        row_packs(fft.first, rows, {step, sign}, rows.count / W, room);
+        const int rest = rows.count % W, whole = rows.count - rest;
+        if (rest == 0) return;
+        // The lanes that are left over repeat others.
+        float* const stage = room + fft.work;
+        for (int row = 0; row < W; ++row)
+            std::memcpy(stage + row * floats, rows.in + (whole + row % rest) * step, bytes);
+        row_packs(fft.first, {stage, stage, floats, W}, {floats, sign}, 1, room);
+        for (int row = 0; row < rest; ++row)
+            std::memcpy(rows.out + (whole + row) * step, stage + row * floats, bytes);
     }
 
     static constexpr FftKernels kTable{W, columns, rows, short_rows};
