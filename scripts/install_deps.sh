@@ -6,7 +6,7 @@
 set -eu
 
 packages="git pkg-config ca-certificates g++ cmake ninja-build libxml2-dev libtrio-dev libcli11-dev
-nlohmann-json3-dev libpng-dev libtiff-dev libfftw3-dev libgtest-dev libgmock-dev libbenchmark-dev liblapack-dev libeigen3-dev
+nlohmann-json3-dev libpng-dev libcairo2-dev libtiff-dev libfftw3-dev libgtest-dev libgmock-dev libbenchmark-dev liblapack-dev libeigen3-dev
 clang-format clang-tidy dpkg-dev file lintian help2man doxygen gdal-bin"
 case "${1:-}" in
 "") ;;

@@ -9,8 +9,9 @@
 
 #include "apart.h"
 #include "commands.h"
+#include "common/drawing/picture.h"
 #include "interrupt.h"
-#include "picture.h"
+#include "output.h"
 #include "progress.h"
 #include "raster.h"
 
@@ -193,13 +194,13 @@ int quicklook(const QuicklookOptions& options) {
     Multilook multilook{raster, options.raster, looks_of(options, raster)};
     multilook.run(raster, options.raster, options.threads, options.waitbar);
     const Stretch stretch = stretch_of(options, multilook.power());
-    Picture picture{multilook.width(), multilook.height(), {}};
-    picture.grey.reserve(multilook.power().size());
+    drawing::Picture picture{multilook.width(), multilook.height(), 1, {}};
+    picture.values.reserve(multilook.power().size());
     for (const float power : multilook.power()) {
         const double share = (decibel(power) - stretch.low_db) / (stretch.high_db - stretch.low_db);
-        picture.grey.push_back(static_cast<std::uint8_t>(std::lround(255.0 * std::clamp(share, 0.0, 1.0))));
+        picture.values.push_back(static_cast<std::uint8_t>(std::lround(255.0 * std::clamp(share, 0.0, 1.0))));
     }
-    write_png(picture, options.picture);
+    write_output(options.picture, png_of(picture));
     if (!multilook.has_power())
         complain(options.raster + ": no sample has a power that is a finite number, the picture is black");
     return kFine;
