@@ -97,6 +97,11 @@ std::vector<Corner> corners_of(GeneralSAR& product) {
     return corners.empty() ? orbit_corners(product) : corners;
 }
 
+bool is_told(std::string_view text) {
+    return !text.empty() && text != "NOT_AVAILABLE" && !text.ends_with("UNDEFINED") && text != "SENSOR UNKNOWN" &&
+           text != "NOT SET";
+}
+
 const RasterDescription* described_raster(const GeneralSAR& product) {
     if (product.GSexists(gsBufferFile)) return &product.bufferFile;
     // A side file in its older form, which only this object reads; it is there in any case.

@@ -39,6 +39,9 @@ std::vector<Corner> orbit_corners(GeneralSAR& product);
 /** The same from the corner grid alone. */
 std::vector<Corner> grid_corners(const GeneralSAR& product);
 
+/** Whether a text of DataSetInfo says something: its members begin with texts that say that nothing is known. */
+bool is_told(std::string_view text);
+
 /** The description of the raster that the header belongs to, in whichever form; null where there is none. */
 const RasterDescription* described_raster(const GeneralSAR& product);
 /** The name of the raster that a header belongs to: the header's name without ".hdr"; nothing for another name. */

@@ -142,8 +142,7 @@ std::string metadata(GeneralSAR& product) {
     const DataSetInfo_Obj& info = product.dataSetInfo;
     std::string text;
     const auto add = [&](const char* key, const std::string& value) {
-        if (!value.empty() && value != "NOT_AVAILABLE" && !value.ends_with("UNDEFINED") &&
-            value != "SENSOR UNKNOWN" && value != "NOT SET")
+        if (is_told(value))
             text += "    <MDI key=\"" + std::string{key} + "\">" + quo::quoted_xml(value) + "</MDI>\n";
     };
     if (product.GSexists(gsDataSetInfo)) {
