@@ -9,7 +9,7 @@
 namespace example {
 namespace {
 
-using drawing::Box, drawing::Canvas, drawing::Frame, drawing::label, drawing::Picture, drawing::Point;
+using drawing::Canvas, drawing::Frame, drawing::label, drawing::Picture, drawing::Point;
 
 constexpr double kDepth = 40.0;                                 // dB from white to black
 constexpr double kTop = Canvas::kHeading + 22.0, kMap = 420.0;  // pixels

@@ -36,6 +36,7 @@ std::string label(double value, int decimals) {
 Ticks ticks_of(const Axis& axis, int most) {
     const auto [low, high] = std::minmax(axis.first, axis.last);
     const double least = (high - low) / std::max(1, most - 1);
+    if (!(least > 1e-30 && least < 1e30)) return {};
     const double power = std::floor(std::log10(least));
     double step = std::pow(10.0, power);
     for (const double factor : {2.0, 2.5, 2.0})

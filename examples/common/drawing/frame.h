@@ -16,7 +16,8 @@ struct Axis {
 
 /** A number with so many decimals. */
 std::string label(double value, int decimals);
-/** Places of an axis at multiples of 1, 2 or 5 times a power of ten, at most so many, and their decimals. */
+/** Places of an axis at multiples of 1, 2 or 5 times a power of ten, at most so many, and their decimals; none
+ * of an axis that is beyond all measure. */
 struct Ticks {
     std::vector<double> places;
     int decimals = 0;

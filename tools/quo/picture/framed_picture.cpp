@@ -7,7 +7,7 @@
 namespace tool {
 namespace {
 
-using drawing::Axis, drawing::Box, drawing::Canvas, drawing::Frame, drawing::Point;
+using drawing::Box, drawing::Canvas, drawing::Frame, drawing::Point;
 
 constexpr double kTop = Canvas::kHeading + 4.0, kSide = 104.0;  // room above and to the right, pixels
 constexpr double kLeast = 320.0;                                // of the longer side
@@ -43,7 +43,7 @@ bool can_be_framed(double width, double height, double aspect) {
     constexpr double kMostPixels = 1 << 25;
     const auto [across, down] = shown_size(width, height, aspect);
     const double most = static_cast<double>(Canvas::kLongest) - 400.0;
-    return across <= most && down <= most && across * down <= kMostPixels;
+    return across <= most && down <= most && down >= 1.0 && across * down <= kMostPixels;
 }
 
 drawing::Picture framed(const drawing::Picture& picture, const FrameAround& around) {

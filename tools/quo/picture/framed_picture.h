@@ -18,7 +18,7 @@ struct FrameAround {
     std::optional<std::pair<drawing::Point, drawing::Point>> north_and_east;
 };
 
-/** Whether a picture of that size is small enough to be framed. */
+/** Whether a picture of that size can be framed: it is neither too large nor stretched to nothing. */
 bool can_be_framed(double width, double height, double aspect);
 
 /** Draws a frame with title, axes, a bar of decibels and an arrow to the north around a picture, which is enlarged

@@ -33,7 +33,8 @@ Unit unit_of(const SpectrumShown& spectrum, double frequency) {
 std::string frequency_text(const SpectrumShown& spectrum, double frequency) {
     const Unit unit = unit_of(spectrum, frequency);
     const double value = frequency * unit.scale;
-    const auto digits = value == 0.0 ? 1 : static_cast<int>(std::floor(std::log10(std::abs(value)))) + 1;
+    const bool has_digits = std::isfinite(value) && value != 0.0;
+    const auto digits = !has_digits ? 1 : static_cast<int>(std::floor(std::log10(std::abs(value)))) + 1;
     return drawing::label(value, std::max(0, 3 - std::max(digits, 0))) + " " + unit.name;
 }
 

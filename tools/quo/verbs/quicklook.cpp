@@ -1,24 +1,20 @@
 #include <algorithm>
 #include <cmath>
-#include <complex>
 #include <filesystem>
-#include <limits>
-#include <memory>
 #include <numbers>
 #include <optional>
-#include <span>
 #include <utility>
 
 #include "apart.h"
 #include "commands.h"
-#include "common/drawing/picture.h"
 #include "framed_picture.h"
 #include "interrupt.h"
+#include "multilook.h"
 #include "output.h"
 #include "product.h"
-#include "progress.h"
 #include "quo_base/geometry.h"
 #include "raster.h"
+#include "stretch.h"
 #include "view.h"
 
 namespace tool {
@@ -29,10 +25,6 @@ struct QuicklookOptions {
     int width = 1000;
     bool north_up = false, world = false, frame = false, waitbar = false;
     int threads = 0;
-};
-
-struct Stretch {
-    double low_db, high_db;
 };
 
 /** What the header beside a raster tells of it. */
@@ -70,168 +62,12 @@ Looks looks_of(const QuicklookOptions& options, const DataFile& raster, const De
     return {static_cast<int>(looks->first), static_cast<int>(looks->second)};
 }
 
-/** The mean power of looks x looks samples each, over the whole raster. Looks at the far ends that are not full
- * are left out. */
-class Multilook {
-public:
-    Multilook(const RasterDescription& raster, const std::string& name, Looks looks)
-        : looks_{std::min(looks.azimuth, raster.NrOfLinesPerImage),
-                 std::min(looks.range, raster.NrOfPixelsPerLine)},
-          width_{static_cast<std::size_t>(raster.NrOfPixelsPerLine / looks_.range)},
-          height_{static_cast<std::size_t>(raster.NrOfLinesPerImage / looks_.azimuth)} {
-        if (width_ * height_ > kMostPixels) {
-            throw Failure(name + ": a picture of " + std::to_string(width_) + " x " + std::to_string(height_) +
-                          " pixels is too large; take more looks");
-        }
-        power_.assign(width_ * height_, 0.0F);
-    }
-
-    /** Each thread reads by itself and works on rows of pixels that are its alone. */
-    void run(const RasterDescription& raster, const std::string& name, int threads, bool waitbar) {
-        Progress progress{waitbar ? "Quick look" : nullptr};
-        const std::int64_t bytes = raster.rasterSize() / std::max<std::int64_t>(1, rows());
-        std::int64_t begun = 0, done = 0;
-        const auto next = [&]() -> std::optional<std::int64_t> {
-            throw_if_interrupted();
-            if (begun == rows()) return std::nullopt;
-            return begun++;
-        };
-        const auto make_worker = [&] {
-            auto band = std::make_unique<Band>(*this, name, raster);
-            return [band = std::move(band)](std::int64_t row) { return band->add(row); };
-        };
-        blocks::in_order(threads, next, make_worker, [&](bool has_power) {
-            has_power_ |= has_power;
-            progress.step(++done * bytes, rows() * bytes);
-        });
-    }
-
-    /** The picture, which is not turned yet. */
-    [[nodiscard]] View view() const { return {looks_, width_, height_}; }
-    [[nodiscard]] const Looks& looks() const { return looks_; }
-    /** Whether any sample has a power that is a finite number. */
-    [[nodiscard]] bool has_power() const { return has_power_; }
-    /** Row after row; values that are no number count as 0. */
-    [[nodiscard]] const std::vector<float>& power() const { return power_; }
-
-private:
-    static constexpr std::size_t kMostPixels = std::size_t{1} << 26;
-
-    [[nodiscard]] std::int64_t rows() const { return static_cast<std::int64_t>(height_); }
-
-    /** What a thread adds up: rows of pixels, tile by tile. */
-    class Band {
-    public:
-        Band(Multilook& whole, const std::string& name, const RasterDescription& raster)
-            : whole_{whole}, file_{name, raster} {}
-
-        /** Whether a row of pixels has power. */
-        bool add(std::int64_t row) {
-            has_power_ = false;
-            const Looks looks = whole_.looks_;
-            row_ = std::span{whole_.power_}.subspan(static_cast<std::size_t>(row) * whole_.width_, whole_.width_);
-            const int first_line = static_cast<int>(row) * looks.azimuth;
-            for_each_tile(looks.azimuth, static_cast<int>(whole_.width_) * looks.range, looks.range,
-                          [&](Tile tile) {
-                              tile.first_line += first_line;
-                              file_.description().is_complex() != 0 ? add(tile, complex_) : add(tile, real_);
-                          });
-            const float scale = 1.0F / (static_cast<float>(looks.azimuth) * static_cast<float>(looks.range));
-            for (float& value : row_) value *= scale;
-            return has_power_;
-        }
-
-    private:
-        template <typename T>
-        void add(const Tile& tile, std::vector<T>& room) {
-            const int looks = whole_.looks_.range;
-            room.resize(tile.size());
-            file_.read(tile, room.data());
-            const T* from = room.data();
-            for (int line = 0; line < tile.lines; ++line) {
-                float* to = row_.data() + tile.first_sample / looks;
-                for (int pixel = 0; pixel < tile.samples / looks; ++pixel) {
-                    for (int look = 0; look < looks; ++look) {
-                        const float value = std::norm(*from++);
-                        const bool finite = std::isfinite(value);
-                        to[pixel] += finite ? value : 0.0F;
-                        has_power_ |= finite;
-                    }
-                }
-            }
-        }
-
-        Multilook& whole_;
-        RasterReader file_;
-        std::span<float> row_;
-        bool has_power_ = false;
-        std::vector<float> real_;  // the samples of a tile, as the raster has them
-        std::vector<fcomplex> complex_;
-    };
-
-    Looks looks_;
-    std::size_t width_, height_;
-    std::vector<float> power_;
-    bool has_power_ = false;
-};
-
-double decibel(float power) {
-    return power > 0.0F ? 10.0 * std::log10(static_cast<double>(power)) : -std::numeric_limits<double>::infinity();
-}
-
-/** The mean powers of blocks of pixels, without the empty ones: in single pixels speckle would reach further than
- * the ground's own contrast does. */
-std::vector<float> block_powers(const std::vector<float>& power, std::size_t width) {
-    constexpr std::size_t kSide = 4;
-    const std::size_t height = power.size() / width;
-    std::vector<float> means;
-    for (std::size_t top = 0; top < height; top += kSide)
-        for (std::size_t left = 0; left < width; left += kSide) {
-            float sum = 0.0F, filled = 0.0F;
-            for (std::size_t row = top; row < std::min(top + kSide, height); ++row)
-                for (std::size_t column = left; column < std::min(left + kSide, width); ++column) {
-                    sum += power[row * width + column];
-                    filled += power[row * width + column] > 0.0F ? 1.0F : 0.0F;
-                }
-            if (filled > 0.0F) means.push_back(sum / filled);
-        }
-    return means;
-}
-
-/** From the 2nd to the 98th percentile of the blocks, and 3 dB more either way. A scene of one level stays dark
- * under what is bright in it, and a dark border does not take the contrast from all else. */
-Stretch automatic_stretch(const std::vector<float>& power, std::size_t width) {
-    constexpr double kMargin = 3.0, kLeast = 15.0, kMost = 35.0;  // dB
-    std::vector<float> means = block_powers(power, width);
-    if (means.empty()) return {0.0, kLeast};
-    const auto percentile = [&](double share) {
-        const auto index = static_cast<std::ptrdiff_t>(share * static_cast<double>(means.size() - 1));
-        std::ranges::nth_element(means, means.begin() + index);
-        return decibel(means[static_cast<std::size_t>(index)]);
-    };
-    const double low = percentile(0.02) - kMargin, high = percentile(0.98) + kMargin;
-    const double lacking = std::max(0.0, kLeast - (high - low));
-    return {std::max(low - lacking / 3.0, high - kMost), high + lacking * 2.0 / 3.0};
-}
-
 Stretch stretch_of(const QuicklookOptions& options, const std::vector<float>& power, std::size_t width) {
     if (options.db == "auto") return automatic_stretch(power, width);
     const auto bounds = number_pair(options.db, ':');
     if (!bounds || !(bounds->first < bounds->second))
         throw WrongUse("--db " + options.db + ": not of the form MIN:MAX or auto");
     return {bounds->first, bounds->second};
-}
-
-drawing::Picture picture_of(const std::vector<float>& power, const Stretch& stretch, const View& view) {
-    drawing::Picture picture{view.width(), view.height(), 1, {}};
-    picture.values.reserve(power.size());
-    for (std::size_t row = 0; row < picture.height; ++row)
-        for (std::size_t column = 0; column < picture.width; ++column) {
-            const double level = decibel(power[view.source(column, row)]);
-            const double share = (level - stretch.low_db) / (stretch.high_db - stretch.low_db);
-            picture.values.push_back(static_cast<std::uint8_t>(std::lround(255.0 * std::clamp(share, 0.0, 1.0))));
-        }
-    return picture;
 }
 
 // --- North ------------------------------------------------------------------------------------------------------
@@ -334,7 +170,7 @@ drawing::Picture with_frame(const drawing::Picture& picture, const QuicklookOpti
     if (const auto bearings = described.pixels ? bearings_of(*described.pixels) : std::nullopt)
         around.north_and_east = north_and_east(view.turned(*bearings));
     if (!can_be_framed(static_cast<double>(picture.width), static_cast<double>(picture.height), around.aspect))
-        throw Failure(options.raster + ": the picture is too large for a frame; take more looks");
+        throw Failure(options.raster + ": the picture is too large, or too flat, for a frame");
     return framed(picture, around);
 }
 
