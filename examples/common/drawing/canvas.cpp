@@ -5,6 +5,7 @@
 #include <cmath>
 #include <new>
 #include <numbers>
+#include <stdexcept>
 
 namespace drawing {
 namespace {
@@ -150,6 +151,9 @@ void Canvas::image(const Picture& picture, const Box& box, bool smooth) {
 }
 
 Picture Canvas::picture() const {
+    const cairo_status_t status = cairo_status(cairo_.get());
+    if (status != CAIRO_STATUS_SUCCESS)
+        throw std::runtime_error{std::string{"the picture cannot be drawn: "} + cairo_status_to_string(status)};
     cairo_surface_flush(surface_.get());
     Picture picture{static_cast<std::size_t>(cairo_image_surface_get_width(surface_.get())),
                     static_cast<std::size_t>(cairo_image_surface_get_height(surface_.get())),

@@ -68,7 +68,8 @@ public:
         cairo_restore(cairo_.get());
     }
 
-    /** What has been drawn; in grey where nothing has a colour. */
+    /** What has been drawn; in grey where nothing has a colour. Throws std::runtime_error where drawing failed,
+     * after which nothing more appears. */
     [[nodiscard]] Picture picture() const;
 
 private:

@@ -223,11 +223,12 @@ int spectrum(const SpectrumOptions& options) {
     const std::string segments = "mean of " + std::to_string(spectra.segments()) + " segments of " +
                                  std::to_string(spectra.lines()) + " lines x " +
                                  std::to_string(spectra.samples()) + " samples";
-    write_output(options.picture,
-                 png_of(draw_spectra(shown(options.raster), segments + "; pale: bin by bin, dark: smoothed over 1/64 of the band",
-                                     {shown_of("Range", "centre", spectra.range(), range, rates.range, rates),
-                                      shown_of("Azimuth", "Doppler centroid", spectra.azimuth(), azimuth,
-                                               rates.azimuth, rates)})));
+    write_output(
+        options.picture,
+        png_of(draw_spectra(
+            shown(options.raster), segments + "; pale: bin by bin, dark: smoothed over 1/64 of the band",
+            {shown_of("Range", "centre", spectra.range(), range, rates.range, rates),
+             shown_of("Azimuth", "Doppler centroid", spectra.azimuth(), azimuth, rates.azimuth, rates)})));
 
     nlohmann::ordered_json json{{"raster", options.raster},
                                 {"segments", spectra.segments()},
