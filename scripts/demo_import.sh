@@ -40,5 +40,8 @@ printf 'latitude_deg,longitude_deg,height_m\n%s,%s,%s\n' "$latitude" "$longitude
 
 echo
 "$quo" quicklook "$folder/scene" "$folder/quicklook.png" --width 500 --north-up --frame --title "Three bursts of IW1"
-"$quo" footprint "$folder/scene.hdr" >"$folder/footprint.geojson"
+echo
+echo "Its outline:"
+"$quo" footprint "$folder/scene.hdr" | tee "$folder/footprint.geojson"
+echo
 echo "In $folder: quicklook.png, with parallels and meridians at every tenth of a degree, and footprint.geojson"

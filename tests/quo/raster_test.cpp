@@ -14,6 +14,8 @@
 #include "quo_base/acquisition.h"
 #include "quo_base/dataset_info.h"
 #include "quo_base/generalSARorbit.h"
+#include "quo_base/image_grid.h"
+#include "quo_base/roi.h"
 #include "raster_folder.h"
 
 namespace {
@@ -114,6 +116,34 @@ TEST_F(RasterVerbs, QuicklookLiesOnTheMapWhicheverWayTheTrackRuns) {
             EXPECT_NEAR(latitude + column * right_lat + row * down_lat, truth[0][5], kOff);
             EXPECT_NEAR(longitude + column * right_deg + row * down_deg, truth[0][6], 2.0 * kOff);
         }
+}
+
+// Of two bursts the second goes back over most of the first: no affine map has a line at two places.
+TEST_F(RasterVerbs, QuicklookOfOverlappingBurstsIsNoMap) {
+    const std::string in = make("in.raw", 300, 900, INT8, 0), header = in + ".hdr";
+    test::write_text(header, test::read_text(test::scene_file("s1a_iw1_slc_20220104_asc.xml")));
+    DataFile raster;
+    raster.setFilename(in.c_str());
+    raster.NrOfLinesPerImage = 300;
+    raster.NrOfPixelsPerLine = 900;
+    raster.CellType = INT8;
+    ASSERT_EQ(raster.write_hdr(), 0);
+    ROI_Obj region;
+    ImageGrid_Obj grid;
+    ASSERT_EQ(region.read_roi(header.c_str(), "ROI"), 0);
+    ASSERT_EQ(grid.setRegion(region), 0);
+    grid.Bursts = 2;
+    grid.LinesPerBurst = 150;
+    ASSERT_EQ(grid.createBuffers(), 0);
+    for (const int back : {0, 130}) {
+        grid.BurstStart_s = {grid.FirstLine_s, grid.FirstLine_s + (150 - back) * grid.LineStep_s};
+        ASSERT_EQ(grid.writehdr(header.c_str()), 0);
+        const test::Finished finished = test::quo({"quicklook", in, file("out.png"), "--world"});
+        EXPECT_EQ(finished.exit_status, back == 0 ? 0 : 1);
+        EXPECT_THAT(finished.err, testing::HasSubstr(back == 0 ? "" : "off any affine map"));
+        EXPECT_EQ(files().contains("out.pgw"), back == 0);
+        std::filesystem::remove(file("out.pgw"));
+    }
 }
 
 // The picture itself is what it is without a frame, which runs around it in black; beside it the bar of decibels.
