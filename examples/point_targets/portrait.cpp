@@ -85,10 +85,8 @@ void draw_cut(Canvas& canvas, const CutShown& cut, const Closeup& closeup) {
     canvas.line(from, to, {.colour = drawing::kRed, .width = 2.0});
     for (const Point& end : {from, to})
         canvas.line({end.x, y - 5.0}, {end.x, y + 6.0}, {.colour = drawing::kRed, .width = 2.0});
-    canvas.text(
-        {to.x + 9.0, y + 3.0},
-        "\u22123 dB: " + label(response.resolution, 3) + " " + cut.unit + ", theory " + label(response.theory, 3),
-        {.down = 0.5, .size = 12.0, .colour = drawing::kRed});
+    canvas.text({to.x + 9.0, y + 3.0}, "\u22123 dB: " + label(response.resolution, 3) + " " + cut.unit,
+                {.down = 0.5, .size = 12.0, .colour = drawing::kRed});
     frame.edge();
 }
 
