@@ -29,7 +29,8 @@ QUO_BASE_C_BEGIN
  * to the process; each entry is written in one piece and has a number of its own. The stack of running calls, with
  * its names, counters and depth, belongs to the thread, and so does the table of the blocks that its calls have
  * allocated: the table of a thread that has ended goes on with the next one that begins. Any thread may free a
- * block. A program turns tracking on before it starts threads, and off when they have ended.
+ * block. A program turns tracking on before it starts threads, and off when they have ended. A thread for whose
+ * stack there is no memory ends the process, with "Memory allocation failure" on the standard error stream.
  *
  * Strings are NUL-terminated byte strings, and none is kept by address beyond the call. A null text is shown as
  * "(null)". No function here changes errno, except that an allocation or opening that fails leaves its reason

@@ -9,7 +9,7 @@
  *
  * Section "DataSetInfo" of an XML header (channel 1), or of a parameter file, with the members' names. -999 marks
  * an unknown number, "NOT_AVAILABLE" an unknown text. Six of the texts hold classifications; programs set and test
- * them through the enumerations, files hold the texts. */
+ * them through the enumerations, files hold the texts. One object serves one thread at a time. */
 class QUO_BASE_API DataSetInfo_Obj : public GeneralSAR_Base {
 public:
     /** Kind of image. The text that the header stores stands beside each value. */

@@ -21,6 +21,10 @@ struct RasterDerivation {
 class GeneralSAR;
 class ImageGrid_Obj;
 
+/** The description of the raster that a product's header belongs to, from the header itself or, in the older form,
+ * from the side file of its raster; null where there is none. It lives as long as the product. */
+QUO_BASE_API const RasterDescription* described_raster(const GeneralSAR& product) noexcept;
+
 /** The pixel grid of a product: the header's section "ImageGrid", else that of its region, where that has the size
  * of the raster, or the header tells of no raster.
  * @param header   the file that the product was read from

@@ -161,8 +161,8 @@ class QUO_BASE_API EnvisatCalibrationFactors : public GeneralSAR_ConfigurationRe
      * WSML_HH or WSML_VV, or, with one range look, WSS_HH or WSS_VV, by polarisation.
      * @return 0; 1 for a null product, another sensor, or any other combination, with the factor unchanged. */
     int writeFactor(GeneralSAR* product) const;
-    /** The same on a header file: read, set, written back. 0, or 1 also when the file cannot be read or saved; the
-     * old file is then whole. */
+    /** The same on a header file: read, set, written back. 0, or 1 also when the file cannot be read or saved, 7;
+     * the old file is then whole. */
     int writeFactor(const char* header_file) const;
 
     double IM_HH[7] = {1, 1, 1, 1, 1, 1, 1}, IM_VV[7] = {1, 1, 1, 1, 1, 1, 1};

@@ -346,8 +346,8 @@ public:
     // side by side on any number of threads, as long as nobody calls anything else of it that is not const.
     //
     // An output may be the very array of an input, but must not overlap with one otherwise, nor with another
-    // output. Points without a solution are told by their status, not in the report; a call that is refused makes
-    // its entry, which is not for several threads at once.
+    // output. Points without a solution are told by their status, not in the report, which a million of them would
+    // fill; a call that is refused makes its entry.
 
     /** Ground points of samples.
      * @return 0, also where samples have none, or there are none; 1 without a model, for a missing array of

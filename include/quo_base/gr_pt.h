@@ -62,9 +62,9 @@ QUO_BASE_API int gr_pt0(double P[3], const double S[3], const double V[3], doubl
 QUO_BASE_API int gr_pt(double P[3], const double S[3], const double V[3], double tau, double fd, double lambda,
                        double omega, double side, double a, double b) QUO_NOEXCEPT;
 
-/** Geometry of one image sample, as gr_pt_lat_lon() finds it. */
+/** Geometry of one image sample, as gr_pt_lat_lon() finds it on the ellipsoid, and SVGetGeometry() at a height. */
 typedef struct GrPtGeometry {
-    double point_m[3];    /**< ground point on the ellipsoid, Earth-fixed */
+    double point_m[3];    /**< ground point, Earth-fixed */
     double latitude_deg;  /**< geodetic, -90 to 90, north positive */
     double longitude_deg; /**< -180 to 180, east positive */
     double incidence_deg; /**< at the target, from the ellipsoid's outward normal to the line to the satellite */

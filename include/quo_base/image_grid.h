@@ -86,6 +86,12 @@ public:
     /** The grid of a region: lines and samples at its steps from its start, in slant range. What was there is
      * dropped. 0; 1 for a region without a step. */
     int setRegion(const ROI_Obj& region);
+    /** Gives a region the axes of a raster of this grid: from its first line, without the delay, and its first
+     * sample to its last ones. Bursts overlap, so that their lines are more than the region's. In ground range the
+     * samples of the first line are taken as evenly spaced in time.
+     * @return 0; 1, with nothing changed and nothing reported, for a grid that makes no image, a null, and a
+     * raster that reaches beyond the bursts or has no line or no sample */
+    int getRegion(ROI_Obj* region, std::int32_t lines, std::int32_t samples) const;
 
     /** Makes it the grid of a raster that was cut out of this one's, at another sampling or the same: the raster's
      * pixel (0, 0) is (line, sample) of this grid's raster, and its lines and samples are so many of this one's

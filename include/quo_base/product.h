@@ -134,6 +134,61 @@ QUO_BASE_API int quo_product_to_radar(const quo_product* product, size_t count, 
                                       const double* y_m, const double* z_m, const double* doppler_hz,
                                       double* azimuth_s, double* range_s, int32_t* status) QUO_NOEXCEPT;
 
+/* ---- Pixels, as arrays ----
+ *
+ * The same, with lines and samples in place of times. They count from 0 at the raster's first line and sample;
+ * whole numbers are the centres of pixels. They may lie outside the raster. Where they stand is told by the
+ * header's section "ImageGrid" or, without one, by its region, where that has the raster's size.
+ *
+ * Statuses, null, not-a-number and overlaps are as above; 1 also for a product that does not place its pixels, 4
+ * where its section "ImageGrid" makes no grid, 7. */
+
+/** When pixels were seen, at zero Doppler, and how far away.
+ * @param[in]  product        whose pixels
+ * @param[in]  count          number of pixels
+ * @param[in]  line, sample   the pixels
+ * @param[out] azimuth_s, range_s  their times
+ * @param[out] status         of each pixel: 0; 1 for one that is not finite or in no burst */
+QUO_BASE_API int quo_product_pixels_to_times(const quo_product* product, size_t count, const double* line,
+                                             const double* sample, double* azimuth_s, double* range_s,
+                                             int32_t* status) QUO_NOEXCEPT;
+
+/** The pixels at which zero-Doppler times stand.
+ * @param[in]  product        whose pixels
+ * @param[in]  count          number of times
+ * @param[in]  azimuth_s, range_s  the times
+ * @param[out] line, sample   the pixels; of what two bursts see, the earlier burst's
+ * @param[out] later_line     the later burst's line; not-a-number where one burst alone sees it
+ * @param[out] status         of each: 0; 1 for times that are not finite, or in no burst or on no ground range */
+QUO_BASE_API int quo_product_times_to_pixels(const quo_product* product, size_t count, const double* azimuth_s,
+                                             const double* range_s, double* line, double* later_line,
+                                             double* sample, int32_t* status) QUO_NOEXCEPT;
+
+/** Where pixels lie on the ground, and how they are seen.
+ * @param[in]  product, count, line, sample  as quo_product_pixels_to_times()
+ * @param[in]  height_m       heights of the ground points; null for 0
+ * @param[out] latitude_deg, longitude_deg, ground_height_m, x_m, y_m, z_m, incidence_deg, look_deg  as
+ *                            quo_product_to_ground()
+ * @param[out] status         of each pixel: 0; 1 for one without times; 10 where no ground is seen
+ * @return 1 also without an orbit or where the header does not tell the look side */
+QUO_BASE_API int quo_product_pixels_to_ground(const quo_product* product, size_t count, const double* line,
+                                              const double* sample, const double* height_m, double* latitude_deg,
+                                              double* longitude_deg, double* ground_height_m, double* x_m,
+                                              double* y_m, double* z_m, double* incidence_deg, double* look_deg,
+                                              int32_t* status) QUO_NOEXCEPT;
+
+/** The pixels that show ground points.
+ * @param[in]  product, count, latitude_deg, longitude_deg, height_m, x_m, y_m, z_m  as quo_product_to_radar()
+ * @param[out] line, later_line, sample  as quo_product_times_to_pixels()
+ * @param[out] status         of each point: 0; 1 for one that is not finite or has no pixel; 12 where it is not
+ * seen
+ * @return 1 also without an orbit, and for points that are not given in exactly one of the two forms */
+QUO_BASE_API int quo_product_ground_to_pixels(const quo_product* product, size_t count, const double* latitude_deg,
+                                              const double* longitude_deg, const double* height_m,
+                                              const double* x_m, const double* y_m, const double* z_m,
+                                              double* line, double* later_line, double* sample,
+                                              int32_t* status) QUO_NOEXCEPT;
+
 /* ---- The raster ---- */
 
 /** Shape and type of the raster's samples. Outputs that are not wanted are null.

@@ -97,8 +97,8 @@ public:
     /** As above, every text cut to `room` - 1 bytes (never inside a UTF-8 character). */
     int readString(int channel, const char* field, char* const* values, int count, std::size_t room) noexcept;
 
-    /** Calls `see` with the whole text of every element that a field path leads to, in document order. 0, also
-     * where there is none; 7. */
+    /** Calls `see` with the whole text of every element that a field path leads to, in document order. An
+     * exception of `see` ends the reading with 7. 0, also where there is none; 7. */
     int readTexts(int channel, const char* field, const std::function<void(std::string_view)>& see) noexcept;
     /** Calls `see` with the text of every element that a field path leads to, in the order of the file, while the
      * file is being read: no document is kept, so that arrays of any length take no memory. What was seen counts

@@ -96,7 +96,7 @@ Run write_coregistration(Folder folder) {
 Run write_factor(Folder folder) {
     auto tables = std::make_shared<EnvisatCalibrationFactors>();
     tables->IM_HH[0] = 17.3;
-    return [tables, file = file_in(folder, "stripmap.hdr")] { return tables->writeFactor(file); };
+    return [tables, file = file_in(folder, "stripmap.hdr")]() noexcept { return tables->writeFactor(file); };
 }
 
 template <typename Document, int (*kUse)(Document& document, const char* file)>

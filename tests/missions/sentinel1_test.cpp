@@ -1,10 +1,9 @@
 #include "missions/sentinel1.h"
 
 #include <gtest/gtest.h>
-#include <tiffio.h>
 
 #include <cmath>
-#include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <string>
 #include <vector>
@@ -16,113 +15,22 @@
 #include "quo_base/mission_import.h"
 #include "quo_base/product.h"
 #include "support/diagnostics.h"
+#include "support/sentinel1.h"
 
 namespace {
 
 namespace fs = std::filesystem;
+using test::kDetected;
+using test::kGrd;
+using test::kPlain;
+using test::kSlc;
+using test::Layout;
+using test::part_of;
+using test::Safe;
+using test::write_tiff;
 
-constexpr const char* kSlc = "S1A_IW_SLC__1SDV_20220104T170557_20220104T170624_041314_04E951_F1F1.SAFE";
-constexpr const char* kGrd = "S1B_IW_GRDH_1SDV_20211223T051122_20211223T051147_030148_039993_5371.SAFE";
 constexpr const char* kOrbit =
     QUO_TEST_DATA "/sentinel1/S1A_OPER_AUX_RESORB_OPOD_20230823T174849_V20230823T141024_20230823T172754.EOF";
-
-/** How a made measurement stores its samples. */
-struct Layout {
-    const char* name;
-    std::uint16_t bits, format, compression;
-    bool tiled, big_endian;
-    std::uint32_t rows;  // of a strip
-};
-constexpr Layout kPlain{"Plain", 32, SAMPLEFORMAT_COMPLEXINT, COMPRESSION_NONE, false, false, 1};
-
-/** Part `part` of a made sample. */
-std::int16_t part_of(std::uint32_t line, std::uint32_t sample, std::uint32_t part) {
-    return static_cast<std::int16_t>(line * 1013 + sample * 37 + part * 5003);
-}
-
-void fill(const Layout& layout, std::uint32_t line, std::uint32_t sample, char* to) {
-    const std::int16_t parts[] = {part_of(line, sample, 0), part_of(line, sample, 1)};
-    const float floats[] = {parts[0] + 0.5F, parts[1] - 0.25F};
-    std::memcpy(to, layout.bits == 64 ? static_cast<const void*>(floats) : parts, layout.bits / 8);
-}
-
-void write_tiff(const std::string& file, const Layout& layout, std::uint32_t lines, std::uint32_t samples,
-                bool with_samples) {
-    TIFF* const tiff = TIFFOpen(file.c_str(), layout.big_endian ? "wb" : "wl");
-    ASSERT_NE(tiff, nullptr);
-    const std::size_t size = layout.bits / 8;
-    TIFFSetField(tiff, TIFFTAG_IMAGEWIDTH, samples);
-    TIFFSetField(tiff, TIFFTAG_IMAGELENGTH, lines);
-    TIFFSetField(tiff, TIFFTAG_BITSPERSAMPLE, layout.bits);
-    TIFFSetField(tiff, TIFFTAG_SAMPLEFORMAT, layout.format);
-    TIFFSetField(tiff, TIFFTAG_COMPRESSION, layout.compression);
-    TIFFSetField(tiff, TIFFTAG_PHOTOMETRIC, PHOTOMETRIC_MINISBLACK);
-    constexpr std::uint32_t kTile = 16;
-    if (layout.tiled) {
-        TIFFSetField(tiff, TIFFTAG_TILEWIDTH, kTile);
-        TIFFSetField(tiff, TIFFTAG_TILELENGTH, kTile);
-    } else {
-        TIFFSetField(tiff, TIFFTAG_ROWSPERSTRIP, layout.rows);
-    }
-    const std::uint32_t wide = layout.tiled ? kTile : samples, high = layout.tiled ? kTile : layout.rows;
-    for (std::uint32_t line = 0; line < (with_samples ? lines : 1); line += high)
-        for (std::uint32_t sample = 0; sample < (with_samples ? samples : 1); sample += wide) {
-            std::vector<char> block(std::size_t{wide} * high * size);
-            for (std::uint32_t i = 0; i < high && line + i < lines; ++i)
-                for (std::uint32_t j = 0; j < wide && sample + j < samples; ++j)
-                    fill(layout, line + i, sample + j, block.data() + (i * wide + j) * size);
-            const auto rows = layout.tiled ? high : std::min(high, lines - line);
-            const auto bytes = static_cast<tmsize_t>(std::size_t{wide} * rows * size);
-            if (layout.tiled)
-                TIFFWriteEncodedTile(tiff, TIFFComputeTile(tiff, sample, line, 0, 0), block.data(), bytes);
-            else
-                TIFFWriteEncodedStrip(tiff, line / high, block.data(), bytes);
-        }
-    TIFFClose(tiff);
-    errno = 0;
-}
-
-std::string replaced(std::string text, const std::string& from, const std::string& to) {
-    for (auto at = text.find(from); at != text.npos; at = text.find(from, at + to.size()))
-        text.replace(at, from.size(), to);
-    return text;
-}
-
-/** A copy of a product, to be changed, with a measurement. */
-class Safe {
-public:
-    Safe(const test::TemporaryFolder& folder, const char* name) : path_{folder.path() / name} {
-        fs::copy(fs::path{QUO_TEST_DATA "/sentinel1"} / name, path_, fs::copy_options::recursive);
-        fs::create_directory(path_ / "measurement");
-        for (const auto& file : fs::directory_iterator{path_ / "annotation"}) annotation_ = file.path();
-        setenv("QUO_TIFF_MODULE", QUO_TEST_TIFF_MODULE, 1);
-    }
-    [[nodiscard]] std::string path() const { return path_.string(); }
-    [[nodiscard]] fs::path annotation() const { return annotation_; }
-    [[nodiscard]] std::string measurement() const {
-        return (path_ / "measurement" / (annotation_.stem().string() + ".tiff")).string();
-    }
-    void change(const std::string& from, const std::string& to) {
-        const std::string text = test::read_text(annotation_), changed = replaced(text, from, to);
-        EXPECT_NE(text, changed) << from;
-        test::write_text(annotation_, changed);
-    }
-    void change_element(const std::string& name, const std::string& content) {
-        std::string text = test::read_text(annotation_);
-        const auto from = text.find("<" + name + ">") + name.size() + 2;
-        text.replace(from, text.find('<', from) - from, content);
-        test::write_text(annotation_, text);
-    }
-    /** An image of 40 lines of 30 samples, no bursts. */
-    void shrink(bool grd) {
-        change(grd ? "<numberOfLines>16705<" : "<numberOfLines>4503<", "<numberOfLines>40<");
-        change(grd ? "<numberOfSamples>26102<" : "<numberOfSamples>22694<", "<numberOfSamples>30<");
-        if (!grd) change("burst>", "past>");
-    }
-
-private:
-    fs::path path_, annotation_;
-};
 
 int import_safe(const std::string& source, const std::string& raster, quo_import_result& result,
                 const char* orbit = nullptr, bool link = false) {
@@ -210,6 +118,90 @@ INSTANTIATE_TEST_SUITE_P(Real, Sentinel1Products,
                          testing::Values(Truth{kSlc, false, 15, 0.001, 0.001, 0.05},
                                          Truth{kGrd, true, 20, 0.001, 0.012, 0.15}),
                          [](const auto& test) { return std::string{test.param.grd ? "Grd" : "Slc"}; });
+
+// The line after the last one is a place for tie points, too, and in no burst: one of them used to cost the
+// others.
+TEST(Sentinel1, DoesWithoutTiePointsInNoBurst) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    Safe safe{folder, kSlc};
+    safe.change("<line>3002<", "<line>4503<");
+    const auto made = std::make_unique<quo::Sentinel1Product>();
+    quo::describe_sentinel1({safe.annotation().string(), "", ""}, "", *made);
+    EXPECT_EQ(made->ties.count, 10);
+    EXPECT_LT(made->ties.most_line, 0.001);
+}
+
+// --- Modes ------------------------------------------------------------------------------------------------------
+
+struct Mode {
+    const char *name, *safe, *mode, *swath, *file;
+    bool bursts;
+    const char* acquisition;
+    int order;
+};
+class Modes : public testing::TestWithParam<Mode> {};
+
+// The real annotations, brought to what other modes have: no bursts and an annotation for every vignette or beam,
+// or five swaths. The lines of bursts lie 1342 apart, so that an image of their time without bursts has them
+// there.
+TEST_P(Modes, AreTakenOverByWhatTheAnnotationHas) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    const Mode mode = GetParam();
+    const bool grd = mode.safe == kGrd;
+    Safe safe{folder, mode.safe};
+    safe.change("<mode>IW<", "<mode>" + std::string{mode.mode} + "<");
+    safe.change("<swath>IW", "<swath>" + std::string{mode.swath});
+    safe.rename("iw", mode.file);
+    safe.change(grd ? "<numberOfSamples>26102<" : "<numberOfSamples>22694<", "<numberOfSamples>30<");
+    if (!grd && !mode.bursts) {
+        const std::string text = test::read_text(safe.annotation());
+        const auto bursts = text.find("<burstList"), rest = text.find("</burstList>");
+        test::write_text(safe.annotation(), text.substr(0, bursts) + "<burstList count=\"0\"/>" +
+                                                text.substr(rest + std::strlen("</burstList>")));
+        safe.change("<linesPerBurst>1501<", "<linesPerBurst>0<");
+        safe.change("<numberOfLines>4503<", "<numberOfLines>4185<");
+        safe.change("<line>1501<", "<line>1342<");
+        safe.change("<line>3002<", "<line>2684<");
+    }
+    if (grd) {
+        const std::string text = test::read_text(safe.annotation());
+        const auto first = text.find("<swathProcParams>"), next = text.find("<swathProcParams>", first + 1);
+        safe.change("</swathProcParamsList>", text.substr(first, next - first) + text.substr(first, next - first) +
+                                                  "</swathProcParamsList>");
+    }
+    const std::uint32_t lines = grd ? 16705 : mode.bursts ? 4503 : 4185;
+    write_tiff(safe.measurement(), grd ? kDetected : kPlain, lines, 30, true);
+    quo_import_result result{};
+    ASSERT_EQ(import_safe(safe.path(), folder.file("scene"), result), 0) << result.message;
+    EXPECT_EQ(result.ties.count, grd ? 20 : 15);
+    EXPECT_LT(result.ties.most_line, 0.001);
+    EXPECT_LT(result.ties.most_ground_m, 0.15);
+
+    GeneralSAR product;
+    ASSERT_EQ(product.GSread((folder.file("scene") + ".hdr").c_str()), 0);
+    EXPECT_STREQ(product.dataSetInfo.AcquisitionMode, mode.acquisition);
+    EXPECT_EQ(product.swathInfo.Bursts, mode.bursts ? 3 : 0);
+    EXPECT_EQ(product.swathInfo.Order, mode.order);
+    EXPECT_EQ(product.roi.Roi.Lines, grd ? 16705 : 4185);
+    EXPECT_EQ(product.dataSetInfo.RangeBandwidth[4] > 0.0, grd);
+
+    // A second annotation like it, such as the next vignette's, can only be told by its name.
+    fs::copy(safe.annotation(), test::replaced(safe.annotation().string(), "00", "09"));
+    EXPECT_EQ(import_safe(safe.path(), folder.file("scene"), result), 1);
+    EXPECT_NE(std::string{result.message}.find("2 annotations of this swath and polarization; name one of them"),
+              std::string::npos)
+        << result.message;
+    EXPECT_EQ(import_safe(safe.annotation().string(), folder.file("scene"), result), 0) << result.message;
+}
+INSTANTIATE_TEST_SUITE_P(Sentinel1, Modes,
+                         testing::Values(Mode{"Stripmap", kSlc, "SM", "S", "s", false, "STRIPMAP", 1},
+                                         Mode{"Vignette", kSlc, "WV", "WV", "wv", false, "STRIPMAP", 1},
+                                         Mode{"ExtraWide", kSlc, "EW", "EW", "ew", true, "SCANSAR", 1},
+                                         Mode{"ExtraWideDetected", kGrd, "EW", "EW", "ew", false, "SCANSAR",
+                                              -999}),
+                         [](const auto& test) { return std::string{test.param.name}; });
 
 // --- Fields -----------------------------------------------------------------------------------------------------
 
@@ -357,7 +349,7 @@ TEST_P(Cuts, KeepTheTimesOfTheirPixels) {
         safe.change("<linesPerBurst>1501<", "<linesPerBurst>4<");  // bursts of four lines, seconds apart
     }
     Layout layout = kPlain;
-    if (grd) layout = {"", 16, SAMPLEFORMAT_UINT, COMPRESSION_NONE, false, false, 1};
+    if (grd) layout = kDetected;
     write_tiff(safe.measurement(), layout, static_cast<std::uint32_t>(cut.lines),
                static_cast<std::uint32_t>(cut.samples), true);
     quo_import_result result{};

@@ -149,10 +149,16 @@ TEST_P(EveryObject, RegistersTheListedFields) {
     const auto object = subject_.make();
     const auto* const record = dynamic_cast<GeneralSAR_ConfigurationRecord*>(object.get());
     ASSERT_EQ(static_cast<std::size_t>(object->elementCount()), fields_.size());
-    for (int i = 0; i < object->elementCount(); ++i)
-        EXPECT_EQ(test::described(*object->element(i)) +
-                      (record ? std::string{","} + record->unit(i) + "," + record->meaning(i) : ""),
-                  fields_[static_cast<std::size_t>(i)].description);
+    for (int i = 0; i < object->elementCount(); ++i) {
+        const parElement& element = *object->element(i);
+        std::string described = test::described(element) + "," + element.unit + "," + element.meaning;
+        if (record) {
+            EXPECT_EQ(std::string{record->unit(i)} + record->meaning(i),
+                      std::string{element.unit} + element.meaning);
+        }
+        while (!record && described.ends_with(',')) described.pop_back();
+        EXPECT_EQ(described, fields_[static_cast<std::size_t>(i)].description);
+    }
     if (!record) return;
     const auto made = GeneralSAR_ConfigurationRecord::make(subject_.name);
     EXPECT_TRUE(made && typeid(*made) == typeid(*record));

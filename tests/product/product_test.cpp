@@ -1,6 +1,7 @@
 #include "quo_base/product.h"
 
 #include "objects/records.h"
+#include "quo_base/image_grid.h"
 #include "support/diagnostics.h"
 #include "support/raster.h"
 #include "support/scenes.h"
@@ -114,6 +115,79 @@ TEST(Product, GeolocatesAsItsOrbitDoes) {
     }
 }
 
+/** Bursts that overlap by half in the place of the scene's region; what is asked of pixels is told of them, too.
+ */
+std::string header_of_bursts(const test::Report& report, const GeneralSAR& scene, ImageGrid_Obj& grid) {
+    EXPECT_EQ(grid.setRegion(scene.roi.Roi), 0);
+    grid.LinesPerBurst = 40;
+    grid.Bursts = 3;
+    EXPECT_EQ(grid.createBuffers(), 0);
+    for (std::size_t i = 0; i < 3; ++i)
+        grid.BurstStart_s[i] = grid.FirstLine_s + 20.0 * static_cast<double>(i) * grid.LineStep_s;
+    const std::string header = report.file("bursts.xml");
+    test::write_text(header, test::read_text(kScene.path(".xml")));
+    grid.setExactNumbers(true);
+    EXPECT_EQ(grid.writehdr(header.c_str()), 0);
+    return header;
+}
+
+TEST(Product, PlacesPixelsAsGridAndOrbitDo) {
+    const test::Report report;
+    GeneralSAR scene;
+    ImageGrid_Obj grid;
+    ASSERT_EQ(scene.GSread(kScene.path(".xml").c_str()), 0);
+    const Product product = open_product(header_of_bursts(report, scene, grid));
+    // In the first burst alone, in both, in no burst, and no number.
+    constexpr double kPlaces[4][2] = {{17.3, 5.5}, {27.25, 311.7}, {1000.0, 5.5}, {3.0, kNaN}};
+    double line[4], sample[4], t[4], range[4], height[4], places[8][4], later[4], expected[2];
+    std::int32_t status[4];
+    for (std::size_t i = 0; i < 4; ++i) {
+        line[i] = kPlaces[i][0];
+        sample[i] = kPlaces[i][1];
+        height[i] = 240.5 + 11.3 * static_cast<double>(i);
+    }
+    ASSERT_EQ(quo_product_pixels_to_times(product.get(), 4, line, sample, t, range, status), 0);
+    EXPECT_EQ(std::to_array(status), (std::array{0, 0, 1, 1}));
+    ASSERT_EQ(quo_product_pixels_to_ground(product.get(), 4, line, sample, height, places[0], places[1], places[2],
+                                           places[3], places[4], places[5], places[6], places[7], status),
+              0);
+    EXPECT_EQ(std::to_array(status), (std::array{0, 0, 1, 1}));
+    for (std::size_t i = 0; i < 2; ++i) {
+        ASSERT_EQ(grid.pixelTimes({1, &line[i], &sample[i]}, {&expected[0], &expected[1]}), 0);
+        EXPECT_EQ(t[i], expected[0]);
+        EXPECT_EQ(range[i], expected[1]);
+        GrPtGeometry seen{};
+        ASSERT_EQ(scene.orbit.SVGetGeometry(t[i], range[i], 0.0, height[i], &seen), 0);
+        const double values[] = {seen.latitude_deg, seen.longitude_deg, height[i],          seen.point_m[0],
+                                 seen.point_m[1],   seen.point_m[2],    seen.incidence_deg, seen.look_deg};
+        for (std::size_t k = 0; k < 8; ++k) EXPECT_NEAR(places[k][i], values[k], 1e-9 * std::abs(values[k]));
+        EXPECT_TRUE(std::isnan(places[i][2]) && std::isnan(t[i + 2]));
+    }
+    // Back, over the arrays of the inputs: from times, and from the ground.
+    const auto expect_back = [&](const double* found_line, const double* found_sample) {
+        EXPECT_NEAR(found_line[0], 17.3, 1e-3);
+        EXPECT_TRUE(std::isnan(later[0]));
+        EXPECT_NEAR(found_line[1], 27.25, 1e-3);
+        EXPECT_NEAR(later[1], 7.25 + 40.0, 1e-3);
+        EXPECT_NEAR(found_sample[1], 311.7, 1e-3);
+        EXPECT_TRUE(std::isnan(found_line[2]) && std::isnan(found_sample[3]));
+        EXPECT_EQ(std::to_array(status), (std::array{0, 0, 1, 1}));
+    };
+    ASSERT_EQ(quo_product_times_to_pixels(product.get(), 4, t, range, t, later, range, status), 0);
+    expect_back(t, range);
+    ASSERT_EQ(quo_product_ground_to_pixels(product.get(), 4, nullptr, nullptr, nullptr, places[3], places[4],
+                                           places[5], places[3], later, places[5], status),
+              0);
+    expect_back(places[3], places[5]);
+    // On the other side of the Earth, and of the ground that the image shows.
+    const double latitude[] = {0.0, 48.0}, longitude[] = {80.0, -97.4};
+    ASSERT_EQ(quo_product_ground_to_pixels(product.get(), 2, latitude, longitude, nullptr, nullptr, nullptr,
+                                           nullptr, line, nullptr, nullptr, status),
+              0);
+    EXPECT_EQ(status[0], 12);
+    EXPECT_TRUE(std::isnan(line[0]) && std::isnan(line[1]));
+}
+
 // ---- the raster
 
 constexpr int kLines = 6, kSamples = 9;
@@ -220,6 +294,21 @@ int read(P p, int line, int lines, int sample, int samples, void* to, std::size_
     return quo_product_read(p, line, lines, sample, samples, FLOAT64, to, room);
 }
 
+int pixels(P p, std::size_t count, const double* line, double* t) {
+    return quo_product_pixels_to_times(p, count, line, kOnes, t, nullptr, nullptr);
+}
+int pixels_of(P p, const double* t, double* line) {
+    return quo_product_times_to_pixels(p, 8, t, kOnes, line, nullptr, nullptr, nullptr);
+}
+int ground_of(P p, const double* line, double* latitude, double* longitude) {
+    return quo_product_pixels_to_ground(p, 8, line, kOnes, nullptr, latitude, longitude, nullptr, nullptr, nullptr,
+                                        nullptr, nullptr, nullptr, nullptr);
+}
+int pixels_seeing(P p, const double* longitude, double* line, double* sample) {
+    return quo_product_ground_to_pixels(p, 8, kOnes, longitude, nullptr, nullptr, nullptr, nullptr, line, nullptr,
+                                        sample, nullptr);
+}
+
 /** A call of each function that a product with a raster answers. */
 constexpr int (*kCalls[])(P p, O o) = {
     [](auto p, O o) { return quo_product_length(p, kArray, &o.length); },
@@ -228,6 +317,10 @@ constexpr int (*kCalls[])(P p, O o) = {
     [](auto p, O o) { return quo_product_text(p, kText, o.text, std::strlen("UAVSAR") + 1); },
     [](auto p, O o) { return ground(p, 8, kOnes, o.numbers, o.numbers + 8); },
     [](auto p, O o) { return radar(p, kOnes, kOnes, o.numbers); },
+    [](auto p, O o) { return pixels(p, 8, kOnes, o.numbers); },
+    [](auto p, O o) { return pixels_of(p, kOnes, o.numbers); },
+    [](auto p, O o) { return ground_of(p, kOnes, o.numbers, o.numbers + 8); },
+    [](auto p, O o) { return pixels_seeing(p, kOnes, o.numbers, o.numbers + 8); },
     [](auto p, O o) { return quo_product_raster(p, &o.lines, nullptr, nullptr); },
     [](auto p, O o) { return read(p, 1, 2, 2, 3, o.numbers, 48); },
 };
@@ -257,6 +350,16 @@ constexpr struct {
     {"no look side", 1, [](P, P bare, O o) { return ground(bare, 8, kOnes, o.numbers); }},
     {"points missing", 1, [](P whole, P, O o) { return radar(whole, nullptr, kOnes, o.numbers); }},
     {"no wavelength", 1, [](P, P bare, O o) { return radar(bare, kOnes, kOnes, o.numbers); }},
+    {"pixels missing", 1, [](P whole, P, O o) { return pixels(whole, 8, nullptr, o.numbers); }},
+    {"pixels beyond memory", 1, [](P whole, P, O o) { return pixels(whole, SIZE_MAX / 8, kOnes, o.numbers); }},
+    {"pixels overlapping", 1, [](P whole, P, O o) { return pixels(whole, 8, o.numbers, o.numbers + 1); }},
+    {"times of pixels missing", 1, [](P whole, P, O o) { return pixels_of(whole, nullptr, o.numbers); }},
+    {"pixels onto pixels", 1, [](P whole, P, O o) { return ground_of(whole, kOnes, o.numbers, o.numbers + 7); }},
+    {"pixels without a look side", 1, [](P, P bare, O o) { return ground_of(bare, kOnes, o.numbers, nullptr); }},
+    {"points of pixels missing", 1,
+     [](P whole, P, O o) { return pixels_seeing(whole, nullptr, o.numbers, nullptr); }},
+    {"points over pixels", 1,
+     [](P whole, P, O o) { return pixels_seeing(whole, kOnes, o.numbers, o.numbers + 3); }},
     {"block into nothing", 1, [](P whole, P, O) { return read(whole, 0, 1, 0, 1, nullptr); }},
     {"block without room", 1, [](P whole, P, O o) { return read(whole, 0, 2, 0, 3, o.numbers, 47); }},
     {"before the lines", 1, [](P whole, P, O o) { return read(whole, -1, 1, 0, 1, o.numbers); }},
@@ -301,6 +404,7 @@ TEST(Product, RefusesWithNothingWrittenAndAnEntry) {
     // What needs nothing needs no array either; what is missing of the geometry is asked only where it counts; and
     // that a raster has gone is told when it is read.
     EXPECT_EQ(ground(whole.get(), 0, nullptr, nullptr), 0);
+    EXPECT_EQ(pixels(whole.get(), 0, nullptr, nullptr), 0);
     EXPECT_EQ(read(whole.get(), kLines, 0, 0, kSamples, nullptr, 0), 0);
     EXPECT_EQ(read(whole.get(), 0, 1, kSamples, 0, nullptr, 0), 0);
     EXPECT_EQ(radar(bare.get(), kOnes, nullptr, outputs.numbers), 0);

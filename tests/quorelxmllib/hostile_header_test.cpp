@@ -113,7 +113,7 @@ TEST_F(HostileHeaderFile, SurvivesEveryChangedByte) {
         for (const char* field : {"Shelf", "Shelf/pages/val", "Shelf/label"}) expect_same_texts(file_, field);
         Shelf object;
         EXPECT_TRUE(!read(object) || place % 16 != 0 || write(object) == 0);
-        EXPECT_NO_THROW(property::read_back(property::HeaderFile{changed})) << place;
+        EXPECT_NO_THROW(property::read_back(property::MemoryFile{changed, "header"})) << place;
     }
 }
 

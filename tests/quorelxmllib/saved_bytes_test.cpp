@@ -59,7 +59,7 @@ TEST(SavedBytes, AreThoseOfSavingTwice) {
         const std::string inside = round == 0 ? "" : random_content(random, 5);
         const std::string text = test::header_text("<S/><x:S xmlns:x=\"urn:x\"/>" + inside);
         SCOPED_TRACE(text);
-        EXPECT_NO_THROW(check_saved(property::HeaderFile{text}, text,
+        EXPECT_NO_THROW(check_saved(property::MemoryFile{text, "header"}, text,
                                     [&](Document& document) { edit_at_random(document, random); }));
     }
 }
@@ -84,7 +84,7 @@ TEST(SavedBytes, KeepWhatTheLayoutDoesNotKnow) {
           inside(repeated("<!-- -->", 3000) + repeated("<d/>", 3000))}) {
         SCOPED_TRACE(text.substr(0, 200));
         EXPECT_NO_THROW(property::check(text));
-        EXPECT_TRUE(test::Shelf{}.readAuxiliaryFile(property::HeaderFile{text}.name(), 1, "Shelf"));
+        EXPECT_TRUE(test::Shelf{}.readAuxiliaryFile(property::MemoryFile{text, "header"}.name(), 1, "Shelf"));
     }
 }
 

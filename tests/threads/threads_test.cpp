@@ -201,15 +201,40 @@ TEST_F(Threads, WorkingAtTheSameTimeFindWhatOneFindsAlone) {
     EXPECT_EQ(std::regex_replace(text, entry, ""), "");
 }
 
-// What an object only tells, it tells to several at a time.
+// What an object only tells, it tells to several at a time; what it finds out when it is first asked, too.
 TEST_F(Threads, AskOneObjectAtTheSameTime) {
+    constexpr int kList = 40;
     polySAR polynomials;
-    ASSERT_EQ(polynomials.CreatePolys(1, 1, 1, 1, 1, 1), 0);
-    polynomials.DC[0].pol[0] = 3.5;
-    const double alone = polynomials.EvaluateDC(0.005, 7.0);
-    side_by_side([&](int) {
-        for (int i = 0; i < 1000; ++i) EXPECT_EQ(polynomials.EvaluateDC(0.005, 7.0), alone);
+    ASSERT_EQ(polynomials.CreatePolys(kList, 1), 0);
+    for (int i = 0; i < kList; ++i) {
+        polynomials.DC[i].taz0 = i;
+        polynomials.DC[i].pol[0] = 3.5 * i;
+    }
+    GeneralSAROrbit orbit;
+    test::load_orbit(test::kScenes[0], orbit);
+    constexpr std::size_t kPoints = 4000;
+    const std::vector<double> times(kPoints, 1167930360.0), ranges(kPoints, 0.0054);
+    double xyz[3];
+    ASSERT_EQ(orbit.sat2earth(times[0], ranges[0], xyz), 0);
+    constexpr int kLength = 512;
+    FftPlan plan{};
+    ASSERT_EQ(fft_makep_c(&plan, kLength, kLength, 1, 1, 1, 0, 1), 0);
+
+    std::vector<double> x(kPoints * kThreads);
+    side_by_side([&](int thread) {
+        for (int i = 0; i < 1000; ++i) {
+            const double t = (i + thread) % kList - 0.5;
+            EXPECT_EQ(polynomials.EvaluateDC(0.005, t), 3.5 * std::ceil(t));
+        }
+        OrbitGround ground;
+        ground.x_m = x.data() + kPoints * static_cast<std::size_t>(thread);
+        EXPECT_EQ(orbit.sat2earth(OrbitSamples{kPoints, times.data(), ranges.data()}, ground), 0);
+        std::vector<fcomplex> row(kLength, {1.0F, 0.0F});
+        EXPECT_EQ(pfft_c(&plan, row.data(), row.data()), 0);
+        EXPECT_EQ(row[0], fcomplex(kLength, 0.0F));
     });
+    EXPECT_THAT(x, testing::Each(xyz[0]));
+    EXPECT_EQ(fft_destp_c(&plan), 0);
 }
 
 // A product is closed by the one thread while the others still work on it.

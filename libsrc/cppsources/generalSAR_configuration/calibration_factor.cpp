@@ -3,6 +3,7 @@
 #include "diagnosticslib/call_frame.h"
 #include "quo_base/generalSAR.h"
 #include "quo_base/generalSAR_configuration.h"
+#include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_session.h"
 
 namespace {
@@ -72,12 +73,14 @@ int EnvisatCalibrationFactors::writeFactor(GeneralSAR* product) const {
 
 int EnvisatCalibrationFactors::writeFactor(const char* header_file) const {
     quo::CallFrame frame{"EnvisatCalibrationFactors::writeFactor", kSource};
-    quo::JoinedSession session{header_file};  // parses the file once, and tells whether it could be saved
-    GeneralSAR product;
-    int status = product.GSread(header_file);
-    if (status == QUO_OK) status = writeFactor(&product);
-    if (status == QUO_OK) status = product.GSwrite(header_file);
-    if (status == QUO_OK) status = session.commit();
-    product.GSdestroy();
-    return status == QUO_OK ? frame.success() : frame.callee(status);
+    return quo::guarded(frame, [&] {
+        quo::JoinedSession session{header_file};  // parses the file once, and tells whether it could be saved
+        GeneralSAR product;
+        int status = product.GSread(header_file);
+        if (status == QUO_OK) status = writeFactor(&product);
+        if (status == QUO_OK) status = product.GSwrite(header_file);
+        if (status == QUO_OK) status = session.commit();
+        product.GSdestroy();
+        return status == QUO_OK ? frame.success() : frame.callee(status);
+    });
 }

@@ -136,7 +136,8 @@ void set_swath(const Annotation& a, GeneralSAR& product) {
     swath.Rank = downlink.integer("rank");
     swath.Bursts = static_cast<std::int32_t>(a.bursts().size());
     swath.Lines_per_burst = swath.Bursts > 0 ? a.root.integer("swathTiming/linesPerBurst") : 0;
-    if (a.swath.size() == 3 && a.swath[2] >= '1' && a.swath[2] <= '9') swath.Order = a.swath[2] - '0';
+    const char number = a.swath.empty() ? '\0' : a.swath.back();  // of merged swaths a letter
+    if (number >= '1' && number <= '9') swath.Order = number - '0';
     swath.Acquisition_Start_Time = a.first_line.seconds();
     swath.ProcessorGain = a.parameters().number("processorScalingFactor");
     swath.Swst_changes = std::max(0, static_cast<std::int32_t>(downlink.list("swstList", "swst").size()) - 1);
@@ -435,11 +436,15 @@ void find_delay(const TiePoints& ties, ImageGrid_Obj& grid) {
         return;
     constexpr double kShare = 0.5;
     double sum_s = 0.0;
-    for (std::size_t i = 0; i < ties.count(); ++i)
+    int count = 0;
+    for (std::size_t i = 0; i < ties.count(); ++i) {
+        if (std::isnan(line_s[i])) continue;  // in no burst
         sum_s += ties.range_s[i] - (ties.azimuth_s[i] - line_s[i]) / kShare;
-    if (!std::isfinite(sum_s)) return;
+        ++count;
+    }
+    if (count == 0 || !std::isfinite(sum_s)) return;
     grid.DelayShare = kShare;
-    grid.DelayReference_s = sum_s / static_cast<double>(ties.count());
+    grid.DelayReference_s = sum_s / count;
 }
 
 /** Root mean square and largest of some differences. */

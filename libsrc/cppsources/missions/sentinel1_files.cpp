@@ -1,5 +1,6 @@
 #include <algorithm>
 #include <filesystem>
+#include <set>
 #include <string>
 #include <system_error>
 #include <vector>
@@ -43,23 +44,35 @@ std::vector<fs::path> annotations_in(const fs::path& folder) {
     return found;
 }
 
+std::string listed(const std::set<std::string>& names) {
+    std::string text;
+    for (const std::string& name : names) text += (text.empty() ? "" : ", ") + name;
+    return text;
+}
+
 fs::path choose(const std::vector<fs::path>& all, const std::string& source, const std::string& swath,
                 const std::string& polarization) {
     std::vector<fs::path> fitting;
-    std::string offered;
+    std::set<std::string> offered, left;
     for (const fs::path& file : all) {
         const auto parts = parts_of(file);
-        offered += (offered.empty() ? "" : ", ") + parts[1] + " " + parts[3];
-        if ((swath.empty() || parts[1] == lower(swath)) &&
-            (polarization.empty() || parts[3] == lower(polarization)))
-            fitting.push_back(file);
+        offered.insert(parts[1] + " " + parts[3]);
+        if ((!swath.empty() && parts[1] != lower(swath)) ||
+            (!polarization.empty() && parts[3] != lower(polarization)))
+            continue;
+        fitting.push_back(file);
+        left.insert(parts[1] + " " + parts[3]);
     }
     if (all.empty()) throw MissionRefusal{QUO_REFUSED, source + ": holds no annotation of Sentinel-1"};
     if (fitting.empty())
-        throw MissionRefusal{QUO_REFUSED, source + ": no such swath and polarization; there are " + offered};
-    if (fitting.size() > 1)
-        throw MissionRefusal{QUO_REFUSED, source + ": choose a swath and a polarization of " + offered +
+        throw MissionRefusal{QUO_REFUSED,
+                             source + ": no such swath and polarization; there are " + listed(offered)};
+    if (left.size() > 1)
+        throw MissionRefusal{QUO_REFUSED, source + ": choose a swath and a polarization of " + listed(left) +
                                               ", or name the annotation"};
+    if (fitting.size() > 1)  // vignettes
+        throw MissionRefusal{QUO_REFUSED, source + ": holds " + std::to_string(fitting.size()) +
+                                              " annotations of this swath and polarization; name one of them"};
     return fitting.front();
 }
 

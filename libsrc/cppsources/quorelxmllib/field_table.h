@@ -140,7 +140,11 @@ constexpr auto one_of(std::span<const std::string_view> texts) {
 inline constexpr auto kFilled = checked_by({.text = parRule::filledText});
 inline constexpr auto kDate = checked_by({.text = parRule::dateText});
 
-/** What the value is, for generated documentation. */
+/** The unit of the values. */
+constexpr auto unit(const char* unit) {
+    return [=](Field& field) { field.unit = unit; };
+}
+/** The same with what the value is, for generated documentation. */
 constexpr auto note(const char* unit, const char* meaning) {
     return [=](Field& field) {
         field.unit = unit;

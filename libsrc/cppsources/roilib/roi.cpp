@@ -17,12 +17,12 @@ using Obj = ROI_Obj;
 // In a parameter file only the last key decides whether the region could be read.
 constexpr quo::FieldTable kTable{
     "ROI",
-    QUO_FIELD(SlowStartTime, quo::kProfileOptional),
-    QUO_FIELD(SlowTimeLength, quo::kProfileOptional),
-    QUO_FIELD(SlowTimeDelta, quo::kProfileOptional),
-    QUO_FIELD(FastStartTime, quo::kProfileOptional),
-    QUO_FIELD(FastTimeLength, quo::kProfileOptional),
-    QUO_FIELD(FastTimeDelta, quo::kProfileOptional),
+    QUO_FIELD(SlowStartTime, quo::kProfileOptional, quo::unit("s")),
+    QUO_FIELD(SlowTimeLength, quo::kProfileOptional, quo::unit("s")),
+    QUO_FIELD(SlowTimeDelta, quo::kProfileOptional, quo::unit("s")),
+    QUO_FIELD(FastStartTime, quo::kProfileOptional, quo::unit("s")),
+    QUO_FIELD(FastTimeLength, quo::kProfileOptional, quo::unit("s")),
+    QUO_FIELD(FastTimeDelta, quo::kProfileOptional, quo::unit("s")),
     QUO_FIELD(Lines, quo::kProfileOptional),
     QUO_FIELD(Samples),
 };

@@ -9,6 +9,7 @@
 namespace quo {
 
 // Reports of the matrix routines carry this fixed source name.
+// Reports name this source so; programs that read them look for it.
 inline constexpr const char* kMatrixSource = R"(..\..\..\libsrc\sources\matrixlib\MatrixAlgebraANSI)";
 
 /** A 1-based matrix seen with 0-based rows and columns. */

@@ -7,6 +7,7 @@
 
 namespace {
 
+// Reports name this source so; programs that read them look for it.
 constexpr const char* kSource = R"(..\..\..\binsrc\cutover\sources\interp)";
 
 /** Multiplies every row by exp(i sign phase). */

@@ -10,6 +10,7 @@
 
 namespace {
 
+// Reports name this source so; programs that read them look for it.
 constexpr const char* kSource = R"(..\..\..\binsrc\cutover\sources\interp)";
 constexpr const char* kBothAxes = "Only one axis may change size";
 constexpr const char* kNoImage = "No image, a size below 1 or beyond any memory";

@@ -10,6 +10,7 @@
 
 namespace {
 
+// Reports name this source so; programs that read them look for it.
 constexpr const char* kSource = R"(..\..\..\binsrc\cutover\sources\interp)";
 constexpr const char* kNoMemory = "Memory allocation failure";
 constexpr int kHalf = 16;       ///< samples on either side of a position, before narrowing

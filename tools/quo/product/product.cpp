@@ -4,6 +4,7 @@
 
 #include "document.h"
 #include "failure.h"
+#include "quo_base/derived_raster.h"
 #include "scene.h"
 
 namespace tool {
@@ -60,6 +61,11 @@ std::vector<Corner> grid_corners(const GeneralSAR& product) {
     return corners;
 }
 
+bool is_told(std::string_view text) {
+    return !text.empty() && text != "NOT_AVAILABLE" && text != "NOT SET" && text != "SENSOR UNKNOWN" &&
+           !text.ends_with(" UNDEFINED");
+}
+
 void read_region(const std::string& header, ROI_Obj& region) {
     const bool found = region.read_roi(header.c_str(), "ROI") == QUO_OK && region.isNULL() == 0;
     const double sum = region.FastStartTime + region.FastTimeLength + region.SlowStartTime + region.SlowTimeLength;
@@ -95,18 +101,6 @@ std::vector<Corner> orbit_corners(GeneralSAR& product) {
 std::vector<Corner> corners_of(GeneralSAR& product) {
     std::vector<Corner> corners = grid_corners(product);
     return corners.empty() ? orbit_corners(product) : corners;
-}
-
-bool is_told(std::string_view text) {
-    return !text.empty() && text != "NOT_AVAILABLE" && !text.ends_with("UNDEFINED") && text != "SENSOR UNKNOWN" &&
-           text != "NOT SET";
-}
-
-const RasterDescription* described_raster(const GeneralSAR& product) {
-    if (product.GSexists(gsBufferFile)) return &product.bufferFile;
-    // A side file in its older form, which only this object reads; it is there in any case.
-    const DataFile& older = product.dataFile.File;
-    return older.NrOfLinesPerImage != 0 && older.NrOfPixelsPerLine != 0 ? &older : nullptr;
 }
 
 std::optional<std::string> raster_of(const std::string& header) {

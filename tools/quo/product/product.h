@@ -22,6 +22,9 @@ const parElement* element_at(GeneralSAR& product, std::string_view field);
 /** Whether a field is known to hold numbers. */
 bool is_numeric_field(GeneralSAR& product, std::string_view field);
 
+/** Whether a text of the description tells something: it is none of the marks of a missing one. */
+bool is_told(std::string_view text);
+
 /** Reads a header's section ROI. Throws Failure where it is not there or holds no sample. */
 void read_region(const std::string& header, ROI_Obj& region);
 
@@ -39,11 +42,6 @@ std::vector<Corner> orbit_corners(GeneralSAR& product);
 /** The same from the corner grid alone. */
 std::vector<Corner> grid_corners(const GeneralSAR& product);
 
-/** Whether a text of DataSetInfo says something: its members begin with texts that say that nothing is known. */
-bool is_told(std::string_view text);
-
-/** The description of the raster that the header belongs to, in whichever form; null where there is none. */
-const RasterDescription* described_raster(const GeneralSAR& product);
 /** The name of the raster that a header belongs to: the header's name without ".hdr"; nothing for another name. */
 std::optional<std::string> raster_of(const std::string& header);
 

@@ -18,14 +18,14 @@ using command_line::Command;
 /** Declares a verb. */
 using AddVerb = void(Command& program);
 AddVerb add_geolocate, add_orbit, add_time, add_tiepoints, add_info, add_validate, add_get, add_set, add_convert,
-    add_quicklook, add_footprint, add_vrt, add_spectrum, add_resample, add_derive, add_fit, add_coregister,
-    add_config, add_debug_dump, add_import;
+    add_quicklook, add_footprint, add_stac, add_vrt, add_spectrum, add_resample, add_derive, add_fit,
+    add_coregister, add_config, add_debug_dump, add_import;
 
 /** All of them, in the order in which the help lists them. */
-inline constexpr AddVerb* kVerbs[] = {add_import,    add_geolocate, add_orbit,      add_time,     add_tiepoints,
-                                      add_info,      add_validate,  add_get,        add_set,      add_convert,
-                                      add_quicklook, add_footprint, add_vrt,        add_spectrum, add_resample,
-                                      add_derive,    add_fit,       add_coregister, add_config,   add_debug_dump};
+inline constexpr AddVerb* kVerbs[] = {
+    add_import,   add_geolocate, add_orbit,   add_time,      add_tiepoints,  add_info,   add_validate,
+    add_get,      add_set,       add_convert, add_quicklook, add_footprint,  add_stac,   add_vrt,
+    add_spectrum, add_resample,  add_derive,  add_fit,       add_coregister, add_config, add_debug_dump};
 
 /** A verb that is being declared, and its options, which live as long as the program. */
 template <typename Options>

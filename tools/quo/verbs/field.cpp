@@ -22,6 +22,13 @@ void require_field(const std::string& field) {
     if (field.find('/') == std::string::npos) throw WrongUse("FIELD " + field + ": give it as Section/Field");
 }
 
+/** The unit of a field that an object registers; empty where it has none. */
+std::string unit_of(const std::string& field) {
+    GeneralSAR product;
+    const parElement* const element = element_at(product, field);
+    return element ? element->unit : "";
+}
+
 // A field that no object registers may be anything.
 bool is_number(const std::string& field) {
     GeneralSAR product;
@@ -79,9 +86,12 @@ int get_field(const FieldOptions& options) {
     require_field(options.field);
     FieldReader reader{options};
     Output output{"-"};
-    if (options.json)
+    if (options.json) {
+        const std::string unit = unit_of(options.field);
         output.write("{\n  \"field\": " + json_text(options.field) +
+                     (unit.empty() ? "" : ",\n  \"unit\": " + json_text(unit)) +
                      ",\n  \"value\": " + (reader.is_list() ? "[\n    " : ""));
+    }
     output.write(reader.text());
     if (options.json) output.write(reader.is_list() ? "\n  ]\n}\n" : "\n}\n");
     output.commit();

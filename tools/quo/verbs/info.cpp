@@ -3,14 +3,14 @@
 #include "facts.h"
 #include "pixels.h"
 #include "product.h"
+#include "quo_base/derived_raster.h"
 #include "raster.h"
 
 namespace tool {
 namespace {
 
-/** A text that is not the mark of a missing one. */
-void add_known(Facts& facts, const char* name, const char* key, std::string_view text, std::string_view unknown) {
-    if (!text.empty() && text != unknown && text != "NOT_AVAILABLE") facts.add_text(name, key, std::string{text});
+void add_known(Facts& facts, const char* name, const char* key, std::string_view text) {
+    if (is_told(text)) facts.add_text(name, key, std::string{text});
 }
 /** A number that is not the mark of a missing one; people see `scale` times it in `unit`. */
 void add_number(Facts& facts, const char* name, const char* key, double value, double scale, const char* unit) {
@@ -23,15 +23,15 @@ void add_time(Facts& facts, const char* name, const char* key, double seconds) {
 }
 
 void add_data_set(Facts& facts, const DataSetInfo_Obj& info) {
-    add_known(facts, "mission", "mission", info.SensorName, "SENSOR UNKNOWN");
-    add_known(facts, "mode", "mode", info.AcquisitionMode, "ACQUISITION MODE UNDEFINED");
-    add_known(facts, "polarization", "polarization", info.Polarization, "");
-    add_known(facts, "swath", "swath", info.Swath, "");
-    add_known(facts, "orbit number", "orbit_number", info.OrbitNumber, "");
-    add_known(facts, "scene", "scene", info.SceneID, "");
-    add_known(facts, "description", "description", info.Description, "");
-    add_known(facts, "image type", "image_type", info.ImageType, "NOT SET");
-    add_known(facts, "projection", "projection", info.Projection, "PROJECTION UNDEFINED");
+    add_known(facts, "mission", "mission", info.SensorName);
+    add_known(facts, "mode", "mode", info.AcquisitionMode);
+    add_known(facts, "polarization", "polarization", info.Polarization);
+    add_known(facts, "swath", "swath", info.Swath);
+    add_known(facts, "orbit number", "orbit_number", info.OrbitNumber);
+    add_known(facts, "scene", "scene", info.SceneID);
+    add_known(facts, "description", "description", info.Description);
+    add_known(facts, "image type", "image_type", info.ImageType);
+    add_known(facts, "projection", "projection", info.Projection);
     facts.add_text("look side", "look_side", info.LookDirection < 0 ? "left" : "right");
 }
 
@@ -67,13 +67,24 @@ void add_raster(Facts& facts, const RasterDescription& raster) {
                {"row_prefix", raster.RowPrefix}});
 }
 
-void add_sampling(Facts& facts, const SamplingConstants_Obj& sampling) {
-    add_number(facts, "PRF", "prf_hz", sampling.prf_hz, 1.0, "Hz");
-    add_number(facts, "sampling rate", "sampling_rate_hz", sampling.frg_hz, 1e-6, "MHz");
-    add_number(facts, "carrier", "carrier_hz", sampling.fc_hz, 1e-9, "GHz");
-    add_number(facts, "wavelength", "wavelength_m", sampling.lambda_m, 1.0, "m");
-    add_number(facts, "range bandwidth", "range_bandwidth_hz", sampling.Brg_hz, 1e-6, "MHz");
-    add_number(facts, "azimuth bandwidth", "azimuth_bandwidth_hz", sampling.Baz_hz, 1.0, "Hz");
+/** Sampling constants in their own units, people see them in `prefix` times those. */
+void add_sampling(Facts& facts, GeneralSAR& product) {
+    constexpr struct {
+        const char *name, *key, *field;
+        double scale;
+        const char* prefix;
+    } kShown[] = {{"PRF", "prf_hz", "prf_hz", 1.0, ""},
+                  {"sampling rate", "sampling_rate_hz", "frg_hz", 1e-6, "M"},
+                  {"carrier", "carrier_hz", "fc_hz", 1e-9, "G"},
+                  {"wavelength", "wavelength_m", "lambda_m", 1.0, ""},
+                  {"range bandwidth", "range_bandwidth_hz", "Brg_hz", 1e-6, "M"},
+                  {"azimuth bandwidth", "azimuth_bandwidth_hz", "Baz_hz", 1.0, ""}};
+    for (const auto& [name, key, field, scale, prefix] : kShown) {
+        const parElement& element =
+            *product.GSelement(gsSamplingConstants, std::string{"SamplingConstants/"} + field);
+        add_number(facts, name, key, *static_cast<const double*>(element.pointer), scale,
+                   (prefix + std::string{element.unit}).c_str());
+    }
 }
 
 void add_corners(Facts& facts, GeneralSAR& product) {
@@ -145,7 +156,7 @@ int show_info(const InfoOptions& options) {
     if (product.GSexists(gsRoi)) add_region(facts, product.roi.Roi);
     if (product.GSexists(gsOrbit)) add_orbit(facts, product.orbit);
     if (const RasterDescription* raster = described_raster(product)) add_raster(facts, *raster);
-    if (product.GSexists(gsSamplingConstants)) add_sampling(facts, product.samplingConstants);
+    if (product.GSexists(gsSamplingConstants)) add_sampling(facts, product);
     add_geometry(facts, options.header, product);
     add_corners(facts, product);
     add_objects(facts, product);

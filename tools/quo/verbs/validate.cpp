@@ -8,6 +8,8 @@
 #include "document.h"
 #include "field_check.h"
 #include "product.h"
+#include "quo_base/derived_raster.h"
+#include "quo_base/image_grid.h"
 #include "raster.h"
 #include "scene.h"
 
@@ -36,6 +38,7 @@ public:
         check_description();
         check_raster();
         check_sampling();
+        check_grid();
         check_region();
         check_orbit();
         check_corners();
@@ -226,25 +229,55 @@ private:
         if (s.Baz_hz > s.prf_hz && s.prf_hz > 0.0) warn("SamplingConstants", "Baz_hz", "is larger than the PRF");
     }
 
-    void check_axis(const char* length_name, double length, double step, int count, const char* count_name,
-                    int raster) {
+    // Where the pixel grid places the raster.
+    void check_grid() {
+        const RasterDescription* raster = described_raster(product_);
+        const int status = read_image_grid(header_.c_str(), product_, grid_);
+        if (status != QUO_OK && status != QUO_REFUSED) return error("ImageGrid", "-", "makes no pixel grid");
+        if (status != QUO_OK || raster == nullptr) return;
+        if (grid_.getRegion(&placed_, raster->NrOfLinesPerImage, raster->NrOfPixelsPerLine) != QUO_OK)
+            error("ImageGrid", grid_.Bursts > 0 ? "BurstStart_s" : "-",
+                  "places no raster of " + std::to_string(raster->NrOfLinesPerImage) + " lines");
+        if (!has(gsSwathInfo) || grid_.Bursts == 0) return;
+        check_count("SwathInfo", "Bursts", product_.swathInfo.Bursts, "ImageGrid/Bursts is", grid_.Bursts);
+        check_count("SwathInfo", "Lines_per_burst", product_.swathInfo.Lines_per_burst,
+                    "ImageGrid/LinesPerBurst is", grid_.LinesPerBurst);
+    }
+    void check_count(const char* object, const char* field, int value, const char* other, int expected) {
+        if (value != expected)
+            warn(object, field, std::to_string(value) + ", but " + other + " " + std::to_string(expected));
+    }
+    void check_axis(const char* length_name, double length, double step, int count) {
         if (!(step > 0.0)) return error("ROI", length_name, "its interval " + exact(step) + " is not above 0");
         if (std::abs(length - step * count) > 0.5 * step) {
             error("ROI", length_name, exact(length) + " is not " + exact(step) + " x " + std::to_string(count));
         }
-        if (raster != count) {
-            warn("ROI", count_name, std::to_string(count) + ", but the raster has " + std::to_string(raster));
-        }
+    }
+    void check_start(const char* field, double start_s, double placed_s, double step_s) {
+        if (std::abs(start_s - placed_s) > 0.5 * step_s)
+            warn("ROI", field, exact(start_s) + ", but the pixel grid begins at " + exact(placed_s));
+    }
+    // The lines of bursts overlap: in time they are fewer than in the raster.
+    void check_against_raster(const ROI_Obj& roi) {
+        const RasterDescription* raster = described_raster(product_);
+        if (raster == nullptr) return;
+        check_count("ROI", "Samples", roi.Samples, "the raster has", raster->NrOfPixelsPerLine);
+        const bool placed = placed_.isNULL() == 0;
+        if (placed && grid_.Bursts > 0)
+            check_count("ROI", "Lines", roi.Lines, "the raster's bursts cover", placed_.Lines);
+        else
+            check_count("ROI", "Lines", roi.Lines, "the raster has", raster->NrOfLinesPerImage);
+        if (!placed) return;
+        check_start("FastStartTime", roi.FastStartTime, placed_.FastStartTime, placed_.FastTimeDelta);
+        check_start("SlowStartTime", roi.SlowStartTime, placed_.SlowStartTime, placed_.SlowTimeDelta);
     }
     void check_region() {
         if (!has(gsRoi)) return;
         const ROI_Obj& roi = product_.roi.Roi;
         if (roi.isNULL() != 0) return warn("ROI", "-", "is empty");
-        const RasterDescription* raster = described_raster(product_);
-        check_axis("FastTimeLength", roi.FastTimeLength, roi.FastTimeDelta, roi.Samples, "Samples",
-                   raster != nullptr ? raster->NrOfPixelsPerLine : roi.Samples);
-        check_axis("SlowTimeLength", roi.SlowTimeLength, roi.SlowTimeDelta, roi.Lines, "Lines",
-                   raster != nullptr ? raster->NrOfLinesPerImage : roi.Lines);
+        check_axis("FastTimeLength", roi.FastTimeLength, roi.FastTimeDelta, roi.Samples);
+        check_axis("SlowTimeLength", roi.SlowTimeLength, roi.SlowTimeDelta, roi.Lines);
+        check_against_raster(roi);
         if (has(gsSamplingConstants) && product_.dataSetInfo.IsProjection(DataSetInfo_Obj::dsSlantRange) &&
             product_.dataSetInfo.RangeLooks == 1) {
             check_same("ROI", "FastTimeDelta", roi.FastTimeDelta, "SamplingConstants/Trg_s",
@@ -344,6 +377,8 @@ private:
 
     GeneralSAR& product_;
     GeneralSAR fresh_;  // what a new product holds
+    ImageGrid_Obj grid_;
+    ROI_Obj placed_;  // what the grid makes of the raster; empty where it makes nothing
     std::string header_;
     std::vector<Finding> findings_;
 };

@@ -32,110 +32,125 @@ std::string element(const char* name, const std::string& content) {
 struct Control {
     double line, sample, latitude_deg, longitude_deg;
 };
+Control between(const Control& a, const Control& b) {
+    return {0.5 * (a.line + b.line), 0.5 * (a.sample + b.sample), 0.5 * (a.latitude_deg + b.latitude_deg),
+            0.5 * (a.longitude_deg + b.longitude_deg)};
+}
+/** Degrees of latitude between two places on the ground. */
+double distance(const Control& a, const Control& b) {
+    const double shrink = std::cos(a.latitude_deg * std::numbers::pi / 180.0);
+    return std::hypot(a.latitude_deg - b.latitude_deg, (a.longitude_deg - b.longitude_deg) * shrink);
+}
 
-/** Control points on a grid of lines by columns. */
-struct Controls {
-    std::vector<double> lines, samples;
-    std::vector<Control> points;
+/** Numbers of lines and samples, evenly spread over a stretch. */
+struct Places {
+    double first, last;
+    int count;
 
-    [[nodiscard]] const Control& at(std::size_t line, std::size_t sample) const {
-        return points[line * samples.size() + sample];
+    /** Adds them to a list, no closer to each other than 1. */
+    void append_to(std::vector<double>& list) const {
+        const int steps = static_cast<int>(std::min(count - 1.0, last - first));
+        for (int i = 0; i <= steps; ++i) list.push_back(first + (last - first) * i / std::max(1, steps));
     }
 };
 
-std::vector<double> even_places(int length, int count) {
-    const int last = std::min(length, count) - 1;
-    std::vector<double> places(static_cast<std::size_t>(last) + 1);
-    for (int i = 0; i <= last; ++i)
-        places[static_cast<std::size_t>(i)] = (length - 1) * static_cast<double>(i) / std::max(1, last);
-    return places;
-}
-
-/** Of bursts every burst's first and last line in the raster: between two bursts the ground goes back. */
-std::vector<double> line_places(const Pixels& pixels, int count) {
+/** The lines at which the ground makes a jump, in their order: where bursts begin, and of ground range where the
+ * polynomial changes. */
+std::vector<double> jumps(const Pixels& pixels) {
     const ImageGrid_Obj& grid = pixels.grid();
-    if (grid.Bursts == 0) return even_places(pixels.lines(), count);
-    std::vector<double> places;
-    for (int burst = 0; burst < grid.Bursts; ++burst) {
-        const double start = static_cast<double>(burst) * grid.LinesPerBurst - grid.FirstLine;
-        const double first = std::max(start, 0.0),
-                     last = std::min(start + grid.LinesPerBurst - 1.0, pixels.lines() - 1.0);
-        if (first > last) continue;
-        places.push_back(first);
-        if (last > first) places.push_back(last);
+    std::vector<double> lines;
+    const auto add = [&](double line_of_grid) {
+        const double line = std::ceil(line_of_grid - grid.FirstLine);
+        if (line > 0.0 && line < pixels.lines()) lines.push_back(line);
+    };
+    for (int burst = 1; burst < grid.Bursts; ++burst) add(static_cast<double>(burst) * grid.LinesPerBurst - 0.5);
+    for (std::size_t i = 1; i < grid.GroundTime_s.size(); ++i)
+        add((0.5 * (grid.GroundTime_s[i - 1] + grid.GroundTime_s[i]) - grid.FirstLine_s) / grid.LineStep_s);
+    return lines;
+}
+
+/** Control points on a grid of lines by columns. */
+class Controls {
+public:
+    /** So many lines of each stretch between two jumps, and so many columns. Of a raster that the orbit does not
+     * see everywhere there are none. */
+    Controls(const Pixels& pixels, int lines, int columns) : pixels_{pixels}, jumps_{jumps(pixels)} {
+        double first = 0.0;
+        for (const double jump : jumps_) {
+            Places{first, jump - 1.0, lines}.append_to(lines_);
+            first = jump;
+        }
+        Places{first, pixels.lines() - 1.0, lines}.append_to(lines_);
+        Places{0.0, pixels.samples() - 1.0, columns}.append_to(samples_);
+        for (const double line : lines_)
+            for (const double sample : samples_) {
+                const auto control = at(line, sample, points_.empty() ? 0.0 : points_.back().longitude_deg);
+                if (control) points_.push_back(*control);
+            }
+        if (points_.size() != lines_.size() * samples_.size()) points_.clear();
     }
-    return places;
-}
+    [[nodiscard]] const std::vector<Control>& points() const { return points_; }
 
-std::optional<Control> control_at(const Pixels& pixels, double line, double sample, double near_longitude_deg) {
-    const auto seen = pixels.geometry(line, sample);
-    if (!seen) return std::nullopt;
-    const double turns = std::round((near_longitude_deg - seen->longitude_deg) / 360.0);
-    return Control{line, sample, seen->latitude_deg, seen->longitude_deg + 360.0 * turns};
-}
+    /** The largest distances, in pixels, of what lies halfway between neighbours from its true place. */
+    struct Error {
+        double along_lines = 0.0, along_samples = 0.0, diagonal = 0.0;
+        [[nodiscard]] double worst() const { return std::max({along_lines, along_samples, diagonal}); }
+    };
+    [[nodiscard]] Error error() const {
+        Error error;
+        for (std::size_t i = 0; i + 1 < lines_.size(); ++i)
+            for (std::size_t j = 0; j + 1 < samples_.size(); ++j) {
+                if (std::ranges::binary_search(jumps_, lines_[i + 1])) continue;
+                const Control* const a = &points_[i * samples_.size() + j];
+                const Control &b = a[1], &c = a[samples_.size()], &d = a[samples_.size() + 1];
+                const double pixel =
+                    std::min(distance(*a, b) / (b.sample - a->sample), distance(*a, c) / (c.line - a->line));
+                const Control top = between(*a, b);
+                error.along_lines = std::max(error.along_lines, off(between(*a, c)) / pixel);
+                error.along_samples = std::max(error.along_samples, off(top) / pixel);
+                error.diagonal = std::max(error.diagonal, off(between(top, between(c, d))) / pixel);
+            }
+        return error;
+    }
 
-std::optional<Controls> make_controls(const Pixels& pixels, int count) {
-    Controls controls{line_places(pixels, count), even_places(pixels.samples(), count), {}};
-    for (const double line : controls.lines)
-        for (const double sample : controls.samples) {
-            const double near = controls.points.empty() ? 0.0 : controls.points.back().longitude_deg;
-            const auto control = control_at(pixels, line, sample, near);
-            if (!control) return std::nullopt;
-            controls.points.push_back(*control);
-        }
-    return controls;
-}
+private:
+    [[nodiscard]] std::optional<Control> at(double line, double sample, double near_longitude_deg) const {
+        const auto seen = pixels_.geometry(line, sample);
+        if (!seen) return std::nullopt;
+        const double turns = std::round((near_longitude_deg - seen->longitude_deg) / 360.0);
+        return Control{line, sample, seen->latitude_deg, seen->longitude_deg + 360.0 * turns};
+    }
+    /** How far a place on the ground is from where its pixel lies. */
+    [[nodiscard]] double off(const Control& place) const {
+        const auto truth = at(place.line, place.sample, place.longitude_deg);
+        return truth ? distance(*truth, place) : 0.0;
+    }
 
-/** The largest distance, in pixels, between the middle of four neighbouring points and where they lie in truth. */
-double interpolation_error(const Pixels& pixels, const Controls& controls) {
-    double worst = 0.0;
-    for (std::size_t i = 0; i + 1 < controls.lines.size(); ++i)
-        for (std::size_t j = 0; j + 1 < controls.samples.size(); ++j) {
-            const Control &a = controls.at(i, j), &b = controls.at(i, j + 1), &c = controls.at(i + 1, j),
-                          &d = controls.at(i + 1, j + 1);
-            const double lines_per_burst = pixels.grid().Bursts > 0 ? pixels.grid().LinesPerBurst : HUGE_VAL;
-            const auto burst_of = [&](double line) {
-                return std::floor((line + pixels.grid().FirstLine + 0.5) / lines_per_burst);
-            };
-            if (burst_of(a.line) != burst_of(c.line)) continue;
-            const auto truth =
-                control_at(pixels, 0.5 * (a.line + c.line), 0.5 * (a.sample + b.sample), a.longitude_deg);
-            if (!truth) continue;
-            // How far a line and a sample reach, in degrees, with longitudes as long as latitudes.
-            const double shrink = std::cos(truth->latitude_deg * std::numbers::pi / 180.0);
-            const auto length = [&](const Control& from, const Control& to, double pixels_between) {
-                return std::hypot(to.latitude_deg - from.latitude_deg,
-                                  (to.longitude_deg - from.longitude_deg) * shrink) /
-                       pixels_between;
-            };
-            const Control middle{0.0, 0.0,
-                                 0.25 * (a.latitude_deg + b.latitude_deg + c.latitude_deg + d.latitude_deg),
-                                 0.25 * (a.longitude_deg + b.longitude_deg + c.longitude_deg + d.longitude_deg)};
-            const double pixel = std::min(length(a, b, b.sample - a.sample), length(a, c, c.line - a.line));
-            worst = std::max(worst, length(middle, *truth, 1.0) / pixel);
-        }
-    return worst;
-}
+    const Pixels& pixels_;
+    const std::vector<double> jumps_;
+    std::vector<double> lines_, samples_;
+    std::vector<Control> points_;
+};
 
 /** As few control points as keep half a pixel. */
-std::string control_points(const Pixels& pixels) {
-    constexpr int kMost = 65;
+std::string control_points(const Pixels& pixels, int lines = 2, int columns = 5) {
+    constexpr std::size_t kMost = 4096;
     constexpr double kTolerated = 0.5;  // pixels
-    for (int count = 5;; count = 2 * count - 1) {
-        const auto controls = make_controls(pixels, count);
-        if (!controls) return {};
-        const double error = interpolation_error(pixels, *controls);
-        if (error > kTolerated && 2 * count - 1 <= kMost) continue;
-        std::string text =
-            "  <!-- Points on the ellipsoid, height 0; between them up to " + fixed(error, 2) +
-            " pixels off. -->\n  <GCPList Projection=\"EPSG:4979\" dataAxisToSRSAxisMapping=\"2,1,3\">\n";
-        int id = 0;
-        for (const Control& point : controls->points)
-            text += "    <GCP Id=\"" + std::to_string(++id) + "\" Pixel=\"" + exact(point.sample + 0.5) +
-                    "\" Line=\"" + exact(point.line + 0.5) + "\" X=\"" + exact(point.longitude_deg) + "\" Y=\"" +
-                    exact(point.latitude_deg) + "\" Z=\"0\" />\n";
-        return text + "  </GCPList>\n";
-    }
+    const Controls controls{pixels, lines, columns};
+    if (controls.points().empty()) return {};
+    const Controls::Error error = controls.error();
+    if (error.worst() > kTolerated && 2 * controls.points().size() <= kMost && std::max(lines, columns) < 1024)
+        return error.along_lines > error.along_samples ? control_points(pixels, 2 * lines - 1, columns)
+                                                       : control_points(pixels, lines, 2 * columns - 1);
+    std::string text =
+        "  <!-- Points on the ellipsoid, height 0; between them up to " + fixed(error.worst(), 2) +
+        " pixels off. -->\n  <GCPList Projection=\"EPSG:4979\" dataAxisToSRSAxisMapping=\"2,1,3\">\n";
+    int id = 0;
+    for (const Control& point : controls.points())
+        text += "    <GCP Id=\"" + std::to_string(++id) + "\" Pixel=\"" + exact(point.sample + 0.5) +
+                "\" Line=\"" + exact(point.line + 0.5) + "\" X=\"" + exact(point.longitude_deg) + "\" Y=\"" +
+                exact(point.latitude_deg) + "\" Z=\"0\" />\n";
+    return text + "  </GCPList>\n";
 }
 
 std::string metadata(GeneralSAR& product) {
@@ -174,7 +189,7 @@ Described describe(const std::string& header) {
     if (Pixels::known(header, product))
         described.before_band = control_points({header, product}) + described.before_band;
     const std::string polarization = product.dataSetInfo.Polarization;
-    if (product.GSexists(gsDataSetInfo) && polarization != "NOT_AVAILABLE")
+    if (product.GSexists(gsDataSetInfo) && is_told(polarization))
         described.band_name = element("Description", quo::quoted_xml(polarization));
     return described;
 }

@@ -1,10 +1,7 @@
 #include "quo_base/derived_raster.h"
 
-#include <algorithm>
 #include <cmath>
-#include <cstdint>
 #include <memory>
-#include <optional>
 #include <string>
 
 #include "diagnosticslib/call_frame.h"
@@ -20,29 +17,6 @@ constexpr const char* kSource = "derived_raster";
 
 bool almost(double a, double b) { return std::abs(a - b) <= 1e-9 * std::abs(b); }
 
-/** The raster that a header describes, in whichever form. */
-const RasterDescription& described(const GeneralSAR& product) {
-    if (product.GSexists(gsBufferFile)) return product.bufferFile;
-    return product.dataFile.File;
-}
-
-/** Line times, without the delay that belongs to zero-Doppler times, and range times of an image's border. */
-struct Border {
-    double first_s = 0.0, last_s = 0.0, near_s = 0.0, far_s = 0.0;
-};
-std::optional<Border> border_of(const ImageGrid_Obj& grid, const RasterDescription& raster) {
-    ImageGrid_Obj lines;
-    if (grid.clone(&lines) != QUO_OK) return std::nullopt;
-    lines.DelayShare = 0.0;
-    const double last_line = raster.NrOfLinesPerImage - 1.0, last_sample = raster.NrOfPixelsPerLine - 1.0;
-    const double line[] = {0.0, last_line, 0.0}, sample[] = {0.0, 0.0, last_sample};
-    double azimuth_s[3], range_s[3];
-    std::int32_t status[3];
-    if (lines.pixelTimes({3, line, sample}, {azimuth_s, range_s, status}) != QUO_OK) return std::nullopt;
-    if (status[0] != QUO_OK || status[1] != QUO_OK || status[2] != QUO_OK) return std::nullopt;
-    return Border{azimuth_s[0], azimuth_s[1], range_s[0], range_s[2]};
-}
-
 /** The sections of a product that place its raster, made to fit a derived one. */
 class Placed {
 public:
@@ -56,7 +30,8 @@ public:
         change_rates(product_.samplingConstants);
         const int status = grid_.cut(how_.first_line, how_.first_sample, how_.line_step, how_.sample_step);
         if (status != QUO_OK) return status;
-        if (product_.GSexists(gsRoi)) move_region(product_.roi.Roi);
+        moved_ = product_.GSexists(gsRoi) && grid_.getRegion(&product_.roi.Roi, raster_.NrOfLinesPerImage,
+                                                             raster_.NrOfPixelsPerLine) == QUO_OK;
         for (GeneralSAR_Base* const object :
              {static_cast<GeneralSAR_Base*>(&grid_), static_cast<GeneralSAR_Base*>(&product_.roi.Roi),
               static_cast<GeneralSAR_Base*>(&product_.samplingConstants)})
@@ -66,21 +41,6 @@ public:
     }
 
 private:
-    void move_region(ROI_Obj& region) {
-        const auto border = border_of(grid_, raster_);
-        if (!border) return;
-        // Bursts overlap: their lines are more than the time that they cover has room for.
-        const int lines =
-            grid_.Bursts == 0
-                ? raster_.NrOfLinesPerImage
-                : static_cast<int>(std::lround((border->last_s - border->first_s) / grid_.LineStep_s)) + 1;
-        const double samples = std::max(1.0, raster_.NrOfPixelsPerLine - 1.0);
-        region.SetSlowAxe(border->first_s, grid_.LineStep_s, lines);
-        region.SetFastAxe(border->near_s,
-                          grid_.GroundLists == 0 ? grid_.SampleStep_s : (border->far_s - border->near_s) / samples,
-                          raster_.NrOfPixelsPerLine);
-        moved_ = true;
-    }
     /** Those that are the image's own: of ground range, and of multilooked or burst images, they are the
      * recording's. */
     void change_rates(SamplingConstants_Obj& sampling) {
@@ -122,14 +82,20 @@ struct Unfinished {
 
 }  // namespace
 
+const RasterDescription* described_raster(const GeneralSAR& product) noexcept {
+    if (product.GSexists(gsBufferFile)) return &product.bufferFile;
+    const DataFile& older = product.dataFile.File;  // always present, described or not
+    return older.NrOfLinesPerImage != 0 && older.NrOfPixelsPerLine != 0 ? &older : nullptr;
+}
+
 int read_image_grid(const char* header, const GeneralSAR& product, ImageGrid_Obj& grid) noexcept {
     quo::CallFrame frame{"read_image_grid", kSource};
     const int status = grid.readhdr(header);
     if (status != QUO_REFUSED) return status == QUO_OK ? frame.success() : frame.callee(status);
-    const RasterDescription& raster = described(product);
+    const RasterDescription* const raster = described_raster(product);
     const ROI_Obj& region = product.roi.Roi;
-    const bool fits = raster.NrOfLinesPerImage == 0 ||
-                      (region.Lines == raster.NrOfLinesPerImage && region.Samples == raster.NrOfPixelsPerLine);
+    const bool fits = raster == nullptr || raster->NrOfLinesPerImage == 0 ||
+                      (region.Lines == raster->NrOfLinesPerImage && region.Samples == raster->NrOfPixelsPerLine);
     if (!product.GSexists(gsRoi) || region.isNULL() != 0 || !fits) return frame.silent(QUO_REFUSED);
     if (const int failed = grid.setRegion(region)) return frame.callee(failed);
     return frame.success();

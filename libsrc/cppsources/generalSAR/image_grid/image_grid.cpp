@@ -23,19 +23,19 @@ constexpr double kAbsent = -999.0;  // of the first element, which is read befor
 using Obj = ImageGrid_Obj;
 constexpr quo::FieldTable kTable{
     "ImageGrid",
-    QUO_FIELD(Epoch_s),
-    QUO_FIELD(FirstLine_s),
-    QUO_FIELD(LineStep_s, quo::above(0.0)),
-    QUO_FIELD(FirstSample_s, quo::above(0.0)),
-    QUO_FIELD(SampleStep_s, quo::at_least(0.0)),
-    QUO_FIELD(GroundStep_m, quo::at_least(0.0)),
+    QUO_FIELD(Epoch_s, quo::unit("s")),
+    QUO_FIELD(FirstLine_s, quo::unit("s")),
+    QUO_FIELD(LineStep_s, quo::above(0.0), quo::unit("s")),
+    QUO_FIELD(FirstSample_s, quo::above(0.0), quo::unit("s")),
+    QUO_FIELD(SampleStep_s, quo::at_least(0.0), quo::unit("s")),
+    QUO_FIELD(GroundStep_m, quo::at_least(0.0), quo::unit("m")),
     QUO_FIELD(DelayShare),
-    QUO_FIELD(DelayReference_s),
+    QUO_FIELD(DelayReference_s, quo::unit("s")),
     QUO_FIELD(FirstLine),
     QUO_FIELD(FirstSample),
     QUO_FIELD(LinesPerBurst, quo::at_least(0)),
-    QUO_FIELD(BurstStart_s, QUO_LENGTH(Bursts)),
-    QUO_FIELD(GroundTime_s, QUO_LENGTH(GroundLists)),
+    QUO_FIELD(BurstStart_s, QUO_LENGTH(Bursts), quo::unit("s")),
+    QUO_FIELD(GroundTime_s, QUO_LENGTH(GroundLists), quo::unit("s")),
     QUO_FIELD(GroundToSlant, QUO_LENGTH(GroundLists, Obj::kTerms)),
     QUO_FIELD(Bursts, quo::at_least(0)),
     QUO_FIELD(GroundLists, quo::at_least(0)),
@@ -172,6 +172,21 @@ int Obj::setRegion(const ROI_Obj& region) {
     if (!grid.isComplete()) return frame.fail(QUO_REFUSED, kNoGrid);
     if (const int status = grid.clone(this)) return frame.callee(status);
     return frame.success();
+}
+
+int Obj::getRegion(ROI_Obj* region, std::int32_t lines, std::int32_t samples) const {
+    if (!region || lines < 1 || samples < 1 || !isComplete()) return QUO_REFUSED;
+    const Axes axes{*this};
+    const auto first_s = axes.line_time(0.0), last_s = axes.line_time(lines - 1.0);
+    if (!first_s || !last_s) return QUO_REFUSED;
+    const double near_s = axes.range_time(0.0, *first_s), far_s = axes.range_time(samples - 1.0, *first_s);
+    const double covered = Bursts == 0 ? lines : std::round((*last_s - *first_s) / LineStep_s) + 1.0;
+    const bool possible = covered >= 1.0 && covered <= std::numeric_limits<std::int32_t>::max();
+    if (!possible || !std::isfinite(near_s + far_s)) return QUO_REFUSED;
+    region->SetSlowAxe(Epoch_s + *first_s, LineStep_s, static_cast<int>(covered));
+    region->SetFastAxe(near_s, GroundLists == 0 ? SampleStep_s : (far_s - near_s) / std::max(1, samples - 1),
+                       samples);
+    return QUO_OK;
 }
 
 int Obj::cut(double line, double sample, double line_step, double sample_step) {

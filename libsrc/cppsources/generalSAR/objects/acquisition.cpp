@@ -9,10 +9,8 @@
 
 #include "diagnosticslib/call_frame.h"
 #include "generalSAR/objects/annex_file.h"
-#include "profilelib/profile_look.h"
 #include "quo_base/datafile.h"
 #include "quo_base/gen_utils.h"
-#include "quo_base/profile.h"
 #include "quorelxmllib/field_table.h"
 #include "roilib/rounding.h"
 #include "sarutillib/ground/bounded_text.h"
@@ -26,16 +24,16 @@ namespace sampling {
 using Obj = SamplingConstants_Obj;
 constexpr quo::FieldTable kTable{
     "SamplingConstants",
-    QUO_FIELD(fc_hz, "CarrierFrequency", quo::above(0.0)),
-    QUO_FIELD(frg_hz, "SamplingRate", quo::above(0.0)),
-    QUO_FIELD(Brg_hz, "RangeBandWidth", quo::above(0.0)),
-    QUO_FIELD(Trg_s, "RangeTSamplingStep", quo::above(0.0)),
-    QUO_FIELD(prf_hz, "PRF", quo::above(0.0)),
-    QUO_FIELD(pri_s, "PRI", quo::above(0.0)),
-    QUO_FIELD(Baz_hz, "AzimuthBandwidth", quo::above(0.0)),
-    QUO_FIELD(brf_hz, "BRF", quo::at_least(0.0)),
-    QUO_FIELD(bri_s, "BRI", quo::at_least(0.0)),
-    QUO_FIELD(lambda_m, "WaveLength", quo::above(0.0)),
+    QUO_FIELD(fc_hz, "CarrierFrequency", quo::above(0.0), quo::unit("Hz")),
+    QUO_FIELD(frg_hz, "SamplingRate", quo::above(0.0), quo::unit("Hz")),
+    QUO_FIELD(Brg_hz, "RangeBandWidth", quo::above(0.0), quo::unit("Hz")),
+    QUO_FIELD(Trg_s, "RangeTSamplingStep", quo::above(0.0), quo::unit("s")),
+    QUO_FIELD(prf_hz, "PRF", quo::above(0.0), quo::unit("Hz")),
+    QUO_FIELD(pri_s, "PRI", quo::above(0.0), quo::unit("s")),
+    QUO_FIELD(Baz_hz, "AzimuthBandwidth", quo::above(0.0), quo::unit("Hz")),
+    QUO_FIELD(brf_hz, "BRF", quo::at_least(0.0), quo::unit("Hz")),
+    QUO_FIELD(bri_s, "BRI", quo::at_least(0.0), quo::unit("s")),
+    QUO_FIELD(lambda_m, "WaveLength", quo::above(0.0), quo::unit("m")),
 };
 }  // namespace sampling
 
@@ -43,11 +41,11 @@ namespace pulse {
 using Obj = SARPulse_Obj;
 constexpr quo::FieldTable kTable{
     "Pulse",
-    QUO_FIELD(PulseLength, quo::above(0.0)),
-    QUO_FIELD(Bandwidth, quo::above(0.0)),
-    QUO_FIELD(PulseKRate),
+    QUO_FIELD(PulseLength, quo::above(0.0), quo::unit("s")),
+    QUO_FIELD(Bandwidth, quo::above(0.0), quo::unit("Hz")),
+    QUO_FIELD(PulseKRate, quo::unit("Hz/s")),
     QUO_FIELD(PulseEnergy, quo::at_least(0.0)),
-    QUO_FIELD(PulseSamplingRate, quo::above(0.0)),
+    QUO_FIELD(PulseSamplingRate, quo::above(0.0), quo::unit("Hz")),
 };
 }  // namespace pulse
 
@@ -55,11 +53,11 @@ namespace attitude {
 using Obj = SensorAttitude_Obj;
 constexpr quo::FieldTable kTable{
     "SensorAttitude",
-    QUO_FIELD(Eq_speed, quo::at_least(0.0)),
-    QUO_FIELD(Eq_distance, quo::at_least(0.0)),
-    QUO_FIELD(Mean_DC),
-    QUO_FIELD(SquintAngle, quo::between(-90.0, 90.0)),
-    QUO_FIELD(AntennaLength, quo::above(0.0)),
+    QUO_FIELD(Eq_speed, quo::at_least(0.0), quo::unit("m/s")),
+    QUO_FIELD(Eq_distance, quo::at_least(0.0), quo::unit("m")),
+    QUO_FIELD(Mean_DC, quo::unit("Hz")),
+    QUO_FIELD(SquintAngle, quo::between(-90.0, 90.0), quo::unit("degrees")),
+    QUO_FIELD(AntennaLength, quo::above(0.0), quo::unit("m")),
     QUO_FIELD(DroopGain),
     QUO_FIELD(Temperature),
 };
@@ -77,8 +75,8 @@ constexpr quo::FieldTable kTable{
     QUO_FIELD(RgMatchedFilterType),
     QUO_FIELD(RgMatchedFilterCoef, quo::between(0.0, 1.0)),
     QUO_FIELD(AzMatchedFilterCoef, quo::between(0.0, 1.0)),
-    QUO_FIELD(RgLookBandwidth, quo::at_least(0.0)),
-    QUO_FIELD(AzLookBandwidth, quo::at_least(0.0)),
+    QUO_FIELD(RgLookBandwidth, quo::at_least(0.0), quo::unit("Hz")),
+    QUO_FIELD(AzLookBandwidth, quo::at_least(0.0), quo::unit("Hz")),
 };
 }  // namespace windows
 
@@ -94,19 +92,6 @@ constexpr quo::FieldTable kTable{
     QUO_FIELD(QL_RangeML, quo::bounds(0, kMaxInt)),
 };
 }  // namespace quicklook
-
-namespace point {
-using Obj = geopoint;
-constexpr quo::FieldTable kTable{"GroundCornersPoints", QUO_FIELD(Point)};
-// The members that the values of Point belong to.
-constexpr double Obj::*kNamed[] = {&Obj::Latitude, &Obj::Longitude, &Obj::Height, &Obj::IncidenceAngle,
-                                   &Obj::LookAngle};
-constexpr const char* kProfileSection = "Coordinates";
-
-std::string section_of(const char* name) {
-    return std::string{kTable.section()} + "/" + std::string{quo::text_or_empty(name)};
-}
-}  // namespace point
 
 /** The numbers that a reference chirp follows from. */
 struct Chirp {
@@ -219,26 +204,4 @@ int QuickLook_Obj::writehdr(const char* file) { return writeAuxiliaryFile(file, 
 int QuickLook_Obj::readhdr(const char* file) {
     readAuxiliaryFile(file, 1, quicklook::kTable.section());
     return QUO_OK;  // a product without a quick-look is as good as one with
-}
-
-QUO_RECORD(geopoint, point::kTable)
-int geopoint::clone(geopoint* to) const {
-    for (const auto member : point::kNamed) to->*member = this->*member;
-    return point::kTable.copy(*this, *to);
-}
-int geopoint::writehdr(const char* file, const char* name) {
-    std::ranges::transform(point::kNamed, Point, [this](auto member) { return this->*member; });
-    return writeAuxiliaryFile(file, 1, point::section_of(name).c_str());
-}
-int geopoint::readhdr(const char* file, const char* name) {
-    // What Point holds becomes the named members even where neither form of the file has the point: the two never
-    // differ after a read.
-    if (!readAuxiliaryFile(file, 1, point::section_of(name).c_str())) {
-        if (const int unread = quo::Record::unread(*this)) return unread;
-        const quo::ProfileLook look{file};
-        GetProfileDoubleArray(point::kProfileSection, name, Point, static_cast<int>(std::size(Point)), file);
-    }
-    const double* value = Point;
-    for (const auto member : point::kNamed) this->*member = *value++;
-    return QUO_OK;
 }

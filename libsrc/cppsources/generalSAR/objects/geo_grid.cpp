@@ -1,9 +1,12 @@
 #include "quo_base/geo_grid.h"
 
+#include <algorithm>
+#include <iterator>
 #include <string>
 
 #include "diagnosticslib/call_frame.h"
-#include "generalSAR/objects/raster_name.h"
+#include "profilelib/profile_look.h"
+#include "quo_base/profile.h"
 #include "quorelxmllib/field_table.h"
 #include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_session.h"
@@ -13,10 +16,23 @@ namespace {
 
 constexpr const char* kSource = "generalSAR";
 constexpr const char* kProfileSection = "GeoGridSize";
-constexpr const char* kRoiSection = "ROI";
+
+namespace point {
+using Obj = geopoint;
+constexpr quo::FieldTable kTable{"GroundCornersPoints", QUO_FIELD(Point)};
+// The members that the values of Point belong to.
+constexpr double Obj::*kNamed[] = {&Obj::Latitude, &Obj::Longitude, &Obj::Height, &Obj::IncidenceAngle,
+                                   &Obj::LookAngle};
+constexpr const char* kProfileSection = "Coordinates";
+
+std::string section_of(const char* name) {
+    return std::string{kTable.section()} + "/" + std::string{quo::text_or_empty(name)};
+}
+}  // namespace point
 
 using Obj = geoCoords_Obj;
-constexpr quo::FieldTable kTable{"GroundCornersPoints", QUO_FIELD(EastingGridSize), QUO_FIELD(NorthingGridSize)};
+constexpr quo::FieldTable kTable{"GroundCornersPoints", QUO_FIELD(EastingGridSize, quo::unit("m")),
+                                 QUO_FIELD(NorthingGridSize, quo::unit("m"))};
 
 struct NamedPoint {
     const char* name;
@@ -62,32 +78,24 @@ int Obj::readhdr(const char* file) {
     });
 }
 
-int GSRoi_Obj::readhdr(const char* file) { return Roi.read_roi(file, kRoiSection); }
-int GSRoi_Obj::writehdr(const char* file) { return Roi.write_roi(file, kRoiSection); }
-int GSRoi_Obj::clone(GSRoi_Obj* to) const { return Roi.clone(&to->Roi); }
-
-int GSDataFile_Obj::readhdr(const char* file) {
-    quo::CallFrame frame{"GSDataFile_Obj::readhdr", kSource};
-    return quo::guarded(frame, [&] {
-        const auto raster = quo::raster_of_header(quo::text_or_empty(file));
-        if (raster && File.read_hdr(raster->c_str()) == QUO_NO_MEMORY) return frame.callee(QUO_NO_MEMORY);
-        return frame.success();  // whatever else the raster says: a product always has this entry
-    });
+QUO_RECORD(geopoint, point::kTable)
+int geopoint::clone(geopoint* to) const {
+    for (const auto member : point::kNamed) to->*member = this->*member;
+    return point::kTable.copy(*this, *to);
 }
-
-int GSDataFile_Obj::writehdr(const char* file) {
-    quo::CallFrame frame{"GSDataFile_Obj::writehdr", kSource};
-    const int status = quo::guarded(frame, [&] {
-        const auto raster = quo::raster_of_header(quo::text_or_empty(file));
-        const std::string kept = File.FileName;
-        if (!raster || File.setFilename(raster->c_str()) != QUO_OK) return frame.success();
-        const int written = File.write_hdr();
-        File.setFilename(kept.c_str());
-        return written == QUO_NO_MEMORY ? frame.silent(written) : frame.success();
-    });
-    // A product without its data file would be neither the old one nor the new one.
-    if (status != QUO_OK) quo::HeaderSession::fail_all(status);
-    return QUO_OK;  // a header is written without its raster, too: the outcome stands in the report alone
+int geopoint::writehdr(const char* file, const char* name) {
+    std::ranges::transform(point::kNamed, Point, [this](auto member) { return this->*member; });
+    return writeAuxiliaryFile(file, 1, point::section_of(name).c_str());
 }
-
-int GSDataFile_Obj::clone(GSDataFile_Obj* to) const { return to->File.clone(&File); }
+int geopoint::readhdr(const char* file, const char* name) {
+    // What Point holds becomes the named members even where neither form of the file has the point: the two never
+    // differ after a read.
+    if (!readAuxiliaryFile(file, 1, point::section_of(name).c_str())) {
+        if (const int unread = quo::Record::unread(*this)) return unread;
+        const quo::ProfileLook look{file};
+        GetProfileDoubleArray(point::kProfileSection, name, Point, static_cast<int>(std::size(Point)), file);
+    }
+    const double* value = Point;
+    for (const auto member : point::kNamed) this->*member = *value++;
+    return QUO_OK;
+}

@@ -8,6 +8,7 @@
 #include "diagnosticslib/call_frame.h"
 #include "quo_base/gen_utils.h"
 #include "quorelxmllib/field_table.h"
+#include "quorelxmllib/guarded.h"
 #include "sarutillib/ground/bounded_text.h"
 #include "sarutillib/ground/checked_size.h"
 #include "sarutillib/ground/file_io.h"
@@ -21,12 +22,12 @@ using Obj = SwathInfo;
 constexpr quo::FieldTable kTable{
     "SwathInfo",
     QUO_FIELD(Rank, quo::at_least(0)),
-    QUO_FIELD(Rgate_bias),
+    QUO_FIELD(Rgate_bias, quo::unit("s")),
     QUO_FIELD(Echoes_per_burst, quo::at_least(0)),
     QUO_FIELD(Lines_per_burst, quo::at_least(0)),
     QUO_FIELD(Bursts, quo::at_least(0)),
     QUO_FIELD(Order),
-    QUO_FIELD(Acquisition_Start_Time),
+    QUO_FIELD(Acquisition_Start_Time, quo::unit("s")),
     QUO_FIELD(Swst_changes, quo::at_least(0)),
     QUO_FIELD(ProcessorGain),
     QUO_FIELD(NoisePower),
@@ -94,20 +95,23 @@ int Obj::readhdr(const char* file) { return kTable.read(*this, file); }
 
 int Obj::readBurstTimes(const char* raster) {
     quo::CallFrame frame{"SwathInfo::readBurstTimes", kSource};
-    // Without a name the side file would be some ".hdr" of the folder.
-    if (quo::text_or_empty(raster).empty()) return frame.fail(QUO_REFUSED, "No raster named");
-    if (const int status = readhdr((std::string{raster} + ".hdr").c_str())) return frame.callee(status);
-    DataFile file;
-    if (const int status = file.read_hdr(raster)) return frame.callee(status);
-    if (const int status = file.open(0)) return frame.callee(status);
+    return quo::guarded(frame, [&] {
+        // Without a name the side file would be some ".hdr" of the folder.
+        if (quo::text_or_empty(raster).empty()) return frame.fail(QUO_REFUSED, "No raster named");
+        if (const int status = readhdr((std::string{raster} + ".hdr").c_str())) return frame.callee(status);
+        DataFile file;
+        if (const int status = file.read_hdr(raster)) return frame.callee(status);
+        if (const int status = file.open(0)) return frame.callee(status);
 
-    const auto layout = layout_of(*this, file);
-    if (!layout) return frame.fail(QUO_REFUSED, "The description makes no bursts");
-    if (quo::file_length(raster).value_or(-1) < layout->bytes)
-        return frame.fail(QUO_READ_FAILED, "The raster is shorter than its bursts");
-    std::vector<double> times;
-    if (!quo::renew_array(times, static_cast<std::size_t>(Bursts))) return frame.fail(QUO_NO_MEMORY, kNoMemory);
-    if (const int status = read_times(file, *layout, times)) return frame.callee(status);
-    BurstStartTimes.swap(times);
-    return frame.success();
+        const auto layout = layout_of(*this, file);
+        if (!layout) return frame.fail(QUO_REFUSED, "The description makes no bursts");
+        if (quo::file_length(raster).value_or(-1) < layout->bytes)
+            return frame.fail(QUO_READ_FAILED, "The raster is shorter than its bursts");
+        std::vector<double> times;
+        if (!quo::renew_array(times, static_cast<std::size_t>(Bursts)))
+            return frame.fail(QUO_NO_MEMORY, kNoMemory);
+        if (const int status = read_times(file, *layout, times)) return frame.callee(status);
+        BurstStartTimes.swap(times);
+        return frame.success();
+    });
 }

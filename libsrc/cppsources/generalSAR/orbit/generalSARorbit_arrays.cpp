@@ -1,5 +1,4 @@
 #include <algorithm>
-#include <cerrno>
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
@@ -8,12 +7,14 @@
 #include <span>
 
 #include "diagnosticslib/call_frame.h"
+#include "diagnosticslib/errno_kept.h"
 #include "generalSAR/orbit/orbit_points.h"
 #include "quo_base/generalSARorbit.h"
+#include "sarutillib/ground/array_extents.h"
 
 // Arrays go through blocks of their own: a block's inputs are all read before its outputs are written, so that an
-// output may take the place of an input. What is not refused opens no frame and enters nothing in the report, both
-// of which are the process's: calls may run side by side.
+// output may take the place of an input. What is not refused enters nothing in the report: a million points
+// without a solution would fill it.
 
 namespace {
 
@@ -31,56 +32,9 @@ int refuse(const char* call, const char* message, int line = __builtin_LINE()) n
     return frame.fail(QUO_REFUSED, message, line);
 }
 
-/** Leaves errno as it was: where a speed does not allow a Doppler, the first guess draws the root of a negative
- * number. */
-class ErrnoKept {
-public:
-    ErrnoKept() noexcept = default;
-    ~ErrnoKept() { errno = before_; }
-    ErrnoKept(ErrnoKept&&) = delete;
-
-private:
-    int before_ = errno;
-};
-
 // --- The arrays of a call ---------------------------------------------------------------------------------------
 
-/** Where an array lies; nowhere for one that is not given. */
-struct Extent {
-    std::uintptr_t first = 0, bytes = 0;
-
-    Extent(const void* data, std::size_t element, std::size_t count) noexcept
-        : first{reinterpret_cast<std::uintptr_t>(data)}, bytes{data ? element * count : 0} {}
-    [[nodiscard]] bool fits() const noexcept { return first <= UINTPTR_MAX - bytes; }
-    [[nodiscard]] bool overlaps(const Extent& other) const noexcept {
-        return bytes > 0 && other.bytes > 0 && first < other.first + other.bytes && other.first < first + bytes;
-    }
-    [[nodiscard]] bool same(const Extent& other) const noexcept {
-        return first == other.first && bytes == other.bytes;
-    }
-};
-
-bool lie_well(std::span<const double* const> inputs, std::span<double* const> outputs, const std::int32_t* status,
-              std::size_t count) noexcept {
-    if (count > PTRDIFF_MAX / sizeof(double)) return false;
-    const Extent told{status, sizeof *status, count};
-    if (!told.fits()) return false;
-    for (const double* const input : inputs) {
-        const Extent in{input, sizeof *input, count};
-        if (!in.fits() || in.overlaps(told)) return false;
-    }
-    for (auto output = outputs.begin(); output != outputs.end(); ++output) {
-        const Extent out{*output, sizeof **output, count};
-        if (!out.fits() || out.overlaps(told)) return false;
-        for (const double* const input : inputs) {
-            const Extent in{input, sizeof *input, count};
-            if (in.overlaps(out) && !in.same(out)) return false;
-        }
-        for (auto other = outputs.begin(); other != output; ++other)
-            if (out.overlaps({*other, sizeof **other, count})) return false;
-    }
-    return true;
-}
+using quo::lie_well;
 
 /** A piece of the arrays that makes one block. */
 struct Piece {
@@ -211,7 +165,7 @@ int Obj::sat2earth(const OrbitSamples& samples, const OrbitGround& ground) const
     std::ranges::transform(kGroundArrays, outputs, [&](const GroundArray& a) { return ground.*a.array; });
     if (!lie_well(inputs, outputs, ground.status, samples.count)) return refuse(kForward, kBadArrays);
 
-    const ErrnoKept kept;
+    const quo::ErrnoKept kept;  // a first guess may draw the root of a negative number
     const quo::OrbitModel& model = *model_;
     const quo::OrbitView view = model.view(lambda_, static_cast<double>(look_sign_));
     const quo::ArrayKernels& kernels = quo::array_kernels();
@@ -243,7 +197,7 @@ int Obj::earth2sat(const OrbitTargets& targets, const OrbitSightings& seen) cons
     double* const outputs[] = {seen.azimuth_s, seen.range_s};
     if (!lie_well(inputs, outputs, seen.status, targets.count)) return refuse(kInverse, kBadArrays);
 
-    const ErrnoKept kept;
+    const quo::ErrnoKept kept;  // a first guess may draw the root of a negative number
     const quo::OrbitModel& model = *model_;
     const quo::OrbitView view = model.view(lambda_, static_cast<double>(look_sign_));
     const quo::ArrayKernels& kernels = quo::array_kernels();

@@ -9,10 +9,10 @@ namespace quo {
 template <typename Obj>
 inline constexpr FieldTable kStateVectorTable{
     "StateVectorData",
-    QUO_FIELD(pSV_m, "pos", QUO_LENGTH(nSV_n, 3)),
-    QUO_FIELD(vSV_mOs, "vel", QUO_LENGTH(nSV_n, 3)),
-    QUO_FIELD(t0SV_s, "TimeFirst"),
-    QUO_FIELD(dtSV_s, "TimeDelta"),
+    QUO_FIELD(pSV_m, "pos", QUO_LENGTH(nSV_n, 3), quo::unit("m")),
+    QUO_FIELD(vSV_mOs, "vel", QUO_LENGTH(nSV_n, 3), quo::unit("m/s")),
+    QUO_FIELD(t0SV_s, "TimeFirst", quo::unit("s")),
+    QUO_FIELD(dtSV_s, "TimeDelta", quo::unit("s")),
     QUO_FIELD(nSV_n, "nStateVectors"),
 };
 

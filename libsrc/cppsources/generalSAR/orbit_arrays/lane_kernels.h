@@ -13,6 +13,7 @@ struct LaneKernels {
     using V = PackVec3<T>;
     using Mask = MaskOf<T>;
     using Run = OrbitRunOf<T>;
+    using Motion = MotionOf<T>;
     static constexpr int kWidth = kLanes<T>;
 
     QUO_LANES_INLINE static T load(const double* from) noexcept { return *reinterpret_cast<const T*>(from); }
@@ -57,6 +58,9 @@ struct LaneKernels {
             for (int lane = 1; lane < kWidth; ++lane) put(runs[static_cast<std::int32_t>(number[lane])], lane, to);
         return to;
     }
+    QUO_LANES_INLINE static Motion gathered_motion(const OrbitRun* runs, T number) noexcept {
+        return motion_of(gather(runs, number).curve());
+    }
     QUO_LANES_INLINE static RunInUseOf<T> spread(const RunInUse& run) noexcept {
         return {fill<T>(run.number), fill<T>(run.start_s), fill<T>(run.earliest_s), fill<T>(run.latest_s)};
     }
@@ -84,16 +88,16 @@ struct LaneKernels {
         const T t = load(block.t_s + i);
         return select(magnitude(t) <= kMost, t, fill<T>(orbit.times.first_s));
     }
-    QUO_LANES_INLINE static void place(const ForwardBlock& block, int i, const Run& run, T u,
+    QUO_LANES_INLINE static void place(const ForwardBlock& block, int i, const Motion& motion, T u,
                                        Sample& sample) noexcept {
         sample.open = magnitude(load(block.t_s + i)) <= kMost;
         sample.solved = Mask{};
         sample.P = V{};
-        sample.S = orbit_position(run.curve(), u);
-        sample.velocity = orbit_velocity(run.curve(), u);
+        sample.S = orbit_position(motion, u);
+        sample.velocity = orbit_velocity(motion, u);
         sample.tau_s = load(block.range_s + i);
         sample.fd_hz = load(block.doppler_hz + i);
-        if (block.want_rate) sample.acceleration = orbit_acceleration(run.curve(), u);
+        if (block.want_rate) sample.acceleration = orbit_acceleration(motion, u);
     }
 
     /** The run that serves the earliest and the latest time of a block, where it serves for all between as well:
@@ -122,15 +126,15 @@ struct LaneKernels {
                                            Sample* samples) noexcept {
         RunInUseOf<T> in_use;
         if (share_run(orbit, block, packs, &in_use)) {
-            const Run run = gather(orbit.runs, in_use.number);
+            const Motion motion = gathered_motion(orbit.runs, in_use.number);
             for (int i = 0; i < packs; ++i)
-                place(block, i * kWidth, run, times_of(orbit, block, i * kWidth) - in_use.start_s, samples[i]);
+                place(block, i * kWidth, motion, times_of(orbit, block, i * kWidth) - in_use.start_s, samples[i]);
             return;
         }
         for (int i = 0; i < packs; ++i) {
             const T t = times_of(orbit, block, i * kWidth);
             in_use = next_run(orbit.times, spread(orbit.fresh), t);
-            place(block, i * kWidth, gather(orbit.runs, in_use.number), t - in_use.start_s, samples[i]);
+            place(block, i * kWidth, gathered_motion(orbit.runs, in_use.number), t - in_use.start_s, samples[i]);
         }
     }
 
@@ -273,7 +277,7 @@ struct LaneKernels {
         V P;
         T rate_m_s;
         RunInUseOf<T> in_use;
-        const Run* run;
+        const Motion* motion;
         TimeSearchOf<T> newton;
         T guess_s;  // absolute
         T t_s, range_s;
@@ -297,18 +301,18 @@ struct LaneKernels {
 
     /** Newton's method for all packs together, each from its guess. Neighbours mostly share a run. */
     QUO_LANES_INLINE static void find_times(const OrbitView& orbit, Search* searches, int packs) noexcept {
-        Run runs[kPacks];
+        Motion motions[kPacks];
         const T length = fill<T>(orbit.times.run_length());
         for (int i = 0; i < packs; ++i) {
             Search& search = searches[i];
             const T start = clamped(search.guess_s - search.in_use.start_s, T{}, length);
             search.newton = TimeSearchOf<T>::begin(start, search.open);
-            search.run = &runs[i];
+            search.motion = &motions[i];
             if (i > 0 && !any(search.in_use.number != searches[i - 1].in_use.number[0]) &&
                 !any(searches[i - 1].in_use.number != search.in_use.number))
-                search.run = searches[i - 1].run;
+                search.motion = searches[i - 1].motion;
             else
-                runs[i] = gather(orbit.runs, search.in_use.number);
+                motions[i] = gathered_motion(orbit.runs, search.in_use.number);
         }
         bool open = true;
         for (int step = 0; step < kInverseSteps && open; ++step) {
@@ -316,7 +320,7 @@ struct LaneKernels {
             for (int i = 0; i < packs; ++i) {
                 Search& search = searches[i];
                 if (!any(search.newton.open)) continue;
-                search.newton.step(search.run->curve(), search.P, {T{}, length}, search.rate_m_s);
+                search.newton.step(*search.motion, search.P, {T{}, length}, search.rate_m_s);
                 open = true;
             }
         }

@@ -52,14 +52,16 @@ constexpr std::int64_t kShortestPolynomial = 40;
 
 namespace plain {
 using Obj = poly;
-constexpr quo::FieldTable kTable{kSetSection, QUO_FIELD(pol), QUO_FIELD(trg0, quo::element("trg0_s")),
-                                 QUO_FIELD(taz0, quo::element("taz0_s"))};
+constexpr quo::FieldTable kTable{kSetSection, QUO_FIELD(pol),
+                                 QUO_FIELD(trg0, quo::element("trg0_s"), quo::unit("s")),
+                                 QUO_FIELD(taz0, quo::element("taz0_s"), quo::unit("s"))};
 }  // namespace plain
 
 namespace extended {
 using Obj = extended_poly;
-constexpr quo::FieldTable kTable{kSetSection, QUO_FIELD(pol), QUO_FIELD(trg0, quo::element("trg0_s")),
-                                 QUO_FIELD(taz0, quo::element("taz0_s"))};
+constexpr quo::FieldTable kTable{kSetSection, QUO_FIELD(pol),
+                                 QUO_FIELD(trg0, quo::element("trg0_s"), quo::unit("s")),
+                                 QUO_FIELD(taz0, quo::element("taz0_s"), quo::unit("s"))};
 }  // namespace extended
 
 namespace counts {

@@ -1,17 +1,24 @@
 #include "quo_base/product.h"
 
 #include <algorithm>
+#include <array>
 #include <cstdint>
 #include <memory>
 #include <optional>
+#include <span>
 #include <string_view>
 #include <utility>
+#include <vector>
 
 #include "datafilelib/raster_region.h"
 #include "datafilelib/sample_kernels.h"
 #include "diagnosticslib/call_frame.h"
+#include "quo_base/derived_raster.h"
 #include "quo_base/generalSAR.h"
+#include "quo_base/image_grid.h"
 #include "quorelxmllib/guarded.h"
+#include "quorelxmllib/header_session.h"
+#include "sarutillib/ground/array_extents.h"
 #include "sarutillib/ground/bounded_text.h"
 #include "sarutillib/ground/checked_size.h"
 #include "sarutillib/ground/handle_table.h"
@@ -27,6 +34,8 @@ constexpr const char* kNoRoom = "There is no room for the values";
 struct OpenProduct {
     GeneralSAR header;
     DataFile raster;  // its name and description; without a name where the product has none
+    ImageGrid_Obj grid;
+    int grid_status = QUO_REFUSED;  // 0 where there is a grid
 };
 
 using OpenProducts = quo::HandleTable<quo_product, const OpenProduct>;
@@ -44,17 +53,16 @@ int with_product(const quo::SharedCall& function, const quo_product* handle, Use
     return product ? use(frame, *product) : frame.fail(QUO_REFUSED, kNotOpen);
 }
 
+int finish(quo::CallFrame& frame, int status) { return status ? frame.callee(status) : frame.success(); }
+
 // --- Opening ----------------------------------------------------------------------------------------------------
 
-/** Takes over the raster that the header describes, in its own section or, in the older form, beside it. */
+/** Takes over the raster that the header describes, if it does. */
 int take_described_raster(OpenProduct& product) {
-    DataFile& beside = product.header.dataFile.File;
-    if (!product.header.GSexists(gsBufferFile))
-        return beside.NrOfLinesPerImage != 0 && beside.NrOfPixelsPerLine != 0 ? product.raster.clone(&beside) : 0;
-    char name[sizeof product.raster.FileName];
-    product.header.bufferFile.getFilename(name);
-    product.raster.copyDescription(product.header.bufferFile);
-    return product.raster.setFilename(name);
+    const RasterDescription* const described = described_raster(product.header);
+    if (!described) return QUO_OK;
+    product.raster.copyDescription(*described);
+    return product.raster.setFilename(product.header.dataFile.File.FileName);  // of the header's name, in any form
 }
 
 bool has_raster(const OpenProduct& product) { return product.raster.FileName[0] != '\0'; }
@@ -144,6 +152,42 @@ const char* missing_geometry(const GeneralSAR& header, bool uses_look_side, bool
     return uses_wavelength && !known ? "The product does not tell the wavelength" : nullptr;
 }
 
+int see_ground(quo::CallFrame& frame, const OpenProduct& product, const OrbitSamples& samples,
+               const OrbitGround& ground) {
+    if (const char* missing = missing_geometry(product.header, true, samples.doppler_hz || ground.fm_rate_hz_s))
+        return frame.fail(QUO_REFUSED, missing);
+    return finish(frame, product.header.orbit.sat2earth(samples, ground));
+}
+
+// --- Pixels -----------------------------------------------------------------------------------------------------
+
+/** The arrays of a call on pixels. */
+struct PixelArrays {
+    std::size_t count;
+    std::span<const double* const> inputs;
+    std::span<double* const> outputs;
+    const std::int32_t* status;
+};
+
+/** One call on the pixels of a product: `use(frame, product)` gives its status. */
+template <typename Use>
+int with_pixels(const quo::SharedCall& function, const quo_product* handle, const PixelArrays& arrays,
+                Use use) noexcept {
+    return with_product(function, handle, [&](quo::CallFrame& frame, const OpenProduct& product) {
+        if (product.grid_status != QUO_OK)
+            return frame.fail(product.grid_status, "The product does not place its pixels");
+        if (!quo::lie_well(arrays.inputs, arrays.outputs, arrays.status, arrays.count))
+            return frame.fail(QUO_REFUSED, "Arrays overlap, or no memory can hold them");
+        return quo::guarded(frame, [&] { return use(frame, product); });
+    });
+}
+
+/** Azimuth and range times between pixels and the ground. */
+struct Times {
+    explicit Times(std::size_t count) : azimuth_s(count), range_s(count) {}
+    std::vector<double> azimuth_s, range_s;
+};
+
 // --- The raster -------------------------------------------------------------------------------------------------
 
 /** A rectangle of a raster. */
@@ -182,9 +226,12 @@ int quo_product_open(const char* header, const char* raster, quo_product** produ
     if (!header || !product) return frame.fail(QUO_REFUSED, kNull);
     return quo::guarded(frame, [&] {
         auto made = std::make_shared<OpenProduct>();
+        const quo::HeaderSession session{header};  // the pixel grid is read from the same document
         if (const int status = made->header.GSread(header)) return frame.callee(status);
         const int status = raster ? made->raster.read_hdr(raster) : take_described_raster(*made);
         if (status != QUO_OK) return frame.callee(status);
+        made->grid_status = read_image_grid(header, made->header, made->grid);
+        if (made->grid_status == QUO_NO_MEMORY) return frame.callee(QUO_NO_MEMORY);
         if (!holds_something(*made)) return frame.fail(QUO_REFUSED, "The file holds no object of a product");
         *product = open_products().hold(std::move(made));
         return frame.success();
@@ -256,10 +303,7 @@ int quo_product_to_ground(const quo_product* product, std::size_t count, const d
     ground.speed_m_s = speed_m_s;
     ground.status = status;
     return with_product("quo_product_to_ground", product, [&](quo::CallFrame& frame, const OpenProduct& open) {
-        if (const char* missing = missing_geometry(open.header, true, doppler_hz || fm_rate_hz_s))
-            return frame.fail(QUO_REFUSED, missing);
-        const int failed = open.header.orbit.sat2earth(samples, ground);
-        return failed ? frame.callee(failed) : frame.success();
+        return see_ground(frame, open, samples, ground);
     });
 }
 
@@ -282,9 +326,90 @@ int quo_product_to_radar(const quo_product* product, std::size_t count, const do
     return with_product("quo_product_to_radar", product, [&](quo::CallFrame& frame, const OpenProduct& open) {
         if (const char* missing = missing_geometry(open.header, false, doppler_hz != nullptr))
             return frame.fail(QUO_REFUSED, missing);
-        const int failed = open.header.orbit.earth2sat(targets, seen);
-        return failed ? frame.callee(failed) : frame.success();
+        return finish(frame, open.header.orbit.earth2sat(targets, seen));
     });
+}
+
+int quo_product_pixels_to_times(const quo_product* product, std::size_t count, const double* line,
+                                const double* sample, double* azimuth_s, double* range_s,
+                                std::int32_t* status) noexcept {
+    const std::array inputs{line, sample};
+    const std::array outputs{azimuth_s, range_s};
+    return with_pixels(
+        "quo_product_pixels_to_times", product, {count, inputs, outputs, status},
+        [&](quo::CallFrame& frame, const OpenProduct& open) {
+            return finish(frame, open.grid.pixelTimes({count, line, sample}, {azimuth_s, range_s, status}));
+        });
+}
+
+int quo_product_times_to_pixels(const quo_product* product, std::size_t count, const double* azimuth_s,
+                                const double* range_s, double* line, double* later_line, double* sample,
+                                std::int32_t* status) noexcept {
+    const std::array inputs{azimuth_s, range_s};
+    const std::array outputs{line, later_line, sample};
+    return with_pixels("quo_product_times_to_pixels", product, {count, inputs, outputs, status},
+                       [&](quo::CallFrame& frame, const OpenProduct& open) {
+                           return finish(frame, open.grid.timePixels({count, azimuth_s, range_s},
+                                                                     {line, later_line, sample, status}));
+                       });
+}
+
+int quo_product_pixels_to_ground(const quo_product* product, std::size_t count, const double* line,
+                                 const double* sample, const double* height_m, double* latitude_deg,
+                                 double* longitude_deg, double* ground_height_m, double* x_m, double* y_m,
+                                 double* z_m, double* incidence_deg, double* look_deg,
+                                 std::int32_t* status) noexcept {
+    const std::array inputs{line, sample, height_m};
+    const std::array outputs{latitude_deg, longitude_deg, ground_height_m, x_m, y_m, z_m, incidence_deg, look_deg};
+    OrbitGround ground;
+    ground.latitude_deg = latitude_deg;
+    ground.longitude_deg = longitude_deg;
+    ground.height_m = ground_height_m;
+    ground.x_m = x_m;
+    ground.y_m = y_m;
+    ground.z_m = z_m;
+    ground.incidence_deg = incidence_deg;
+    ground.look_deg = look_deg;
+    ground.status = status;
+    return with_pixels(
+        "quo_product_pixels_to_ground", product, {count, inputs, outputs, status},
+        [&](quo::CallFrame& frame, const OpenProduct& open) {
+            Times times{count};
+            const int failed =
+                open.grid.pixelTimes({count, line, sample}, {times.azimuth_s.data(), times.range_s.data()});
+            if (failed) return frame.callee(failed);
+            return see_ground(frame, open,
+                              {count, times.azimuth_s.data(), times.range_s.data(), nullptr, height_m}, ground);
+        });
+}
+
+int quo_product_ground_to_pixels(const quo_product* product, std::size_t count, const double* latitude_deg,
+                                 const double* longitude_deg, const double* height_m, const double* x_m,
+                                 const double* y_m, const double* z_m, double* line, double* later_line,
+                                 double* sample, std::int32_t* status) noexcept {
+    const std::array inputs{latitude_deg, longitude_deg, height_m, x_m, y_m, z_m};
+    const std::array outputs{line, later_line, sample};
+    const OrbitTargets targets{.count = count,
+                               .latitude_deg = latitude_deg,
+                               .longitude_deg = longitude_deg,
+                               .height_m = height_m,
+                               .x_m = x_m,
+                               .y_m = y_m,
+                               .z_m = z_m};
+    return with_pixels("quo_product_ground_to_pixels", product, {count, inputs, outputs, status},
+                       [&](quo::CallFrame& frame, const OpenProduct& open) {
+                           Times times{count};
+                           std::vector<std::int32_t> seen(count);
+                           const int failed = open.header.orbit.earth2sat(
+                               targets, {times.azimuth_s.data(), times.range_s.data(), seen.data()});
+                           if (failed) return frame.callee(failed);
+                           const int placed =
+                               open.grid.timePixels({count, times.azimuth_s.data(), times.range_s.data()},
+                                                    {line, later_line, sample, status});
+                           for (std::size_t i = 0; status && i < count; ++i)
+                               if (seen[i] != QUO_OK) status[i] = seen[i];
+                           return finish(frame, placed);
+                       });
 }
 
 int quo_product_raster(const quo_product* product, std::int32_t* lines, std::int32_t* samples,

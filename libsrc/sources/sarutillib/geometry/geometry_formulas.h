@@ -21,33 +21,56 @@ struct StateOf {
     V position, velocity, acceleration;
 };
 
+/** One coordinate of a segment with the coefficients of its derivatives, for more than one time. */
 template <class T>
-QUO_LANES_INLINE constexpr T position_5(const T* c, T u) noexcept {
-    return (((c[0] * u + c[1]) * u + c[2]) * u + c[3]) * u + c[4];
+struct AxisMotionOf {
+    T place[5], rate[3], bend[2];
+
+    QUO_LANES_INLINE static constexpr AxisMotionOf of(const T* c) noexcept {
+        return {{c[0], c[1], c[2], c[3], c[4]}, {4.0 * c[0], 3.0 * c[1], 2.0 * c[2]}, {12.0 * c[0], 6.0 * c[1]}};
+    }
+    [[nodiscard]] QUO_LANES_INLINE constexpr T position(T u) const noexcept {
+        return (((place[0] * u + place[1]) * u + place[2]) * u + place[3]) * u + place[4];
+    }
+    [[nodiscard]] QUO_LANES_INLINE constexpr T velocity(T u) const noexcept {
+        return ((rate[0] * u + rate[1]) * u + rate[2]) * u + place[3];
+    }
+    [[nodiscard]] QUO_LANES_INLINE constexpr T acceleration(T u) const noexcept {
+        return (bend[0] * u + bend[1]) * u + rate[2];
+    }
+};
+template <class T>
+struct MotionOf {
+    AxisMotionOf<T> x, y, z;
+};
+template <class T>
+QUO_LANES_INLINE constexpr MotionOf<T> motion_of(const SegmentOf<T>& c) noexcept {
+    return {AxisMotionOf<T>::of(c.x), AxisMotionOf<T>::of(c.y), AxisMotionOf<T>::of(c.z)};
 }
 template <class T>
-QUO_LANES_INLINE constexpr T velocity_5(const T* c, T u) noexcept {
-    return ((4.0 * c[0] * u + 3.0 * c[1]) * u + 2.0 * c[2]) * u + c[3];
+QUO_LANES_INLINE constexpr const MotionOf<T>& motion_of(const MotionOf<T>& c) noexcept {
+    return c;
 }
-template <class T>
-QUO_LANES_INLINE constexpr T acceleration_5(const T* c, T u) noexcept {
-    return (12.0 * c[0] * u + 6.0 * c[1]) * u + 2.0 * c[2];
+
+// C is a segment or a motion.
+template <class T, class C = SegmentOf<T>>
+QUO_LANES_INLINE constexpr Vector<T> orbit_position(const C& curve, T u) noexcept {
+    const auto& c = motion_of(curve);
+    return {c.x.position(u), c.y.position(u), c.z.position(u)};
 }
-template <class T>
-QUO_LANES_INLINE constexpr Vector<T> orbit_position(const SegmentOf<T>& c, T u) noexcept {
-    return {position_5(c.x, u), position_5(c.y, u), position_5(c.z, u)};
+template <class T, class C = SegmentOf<T>>
+QUO_LANES_INLINE constexpr Vector<T> orbit_velocity(const C& curve, T u) noexcept {
+    const auto& c = motion_of(curve);
+    return {c.x.velocity(u), c.y.velocity(u), c.z.velocity(u)};
 }
-template <class T>
-QUO_LANES_INLINE constexpr Vector<T> orbit_velocity(const SegmentOf<T>& c, T u) noexcept {
-    return {velocity_5(c.x, u), velocity_5(c.y, u), velocity_5(c.z, u)};
-}
-template <class T>
-QUO_LANES_INLINE constexpr Vector<T> orbit_acceleration(const SegmentOf<T>& c, T u) noexcept {
-    return {acceleration_5(c.x, u), acceleration_5(c.y, u), acceleration_5(c.z, u)};
+template <class T, class C = SegmentOf<T>>
+QUO_LANES_INLINE constexpr Vector<T> orbit_acceleration(const C& curve, T u) noexcept {
+    const auto& c = motion_of(curve);
+    return {c.x.acceleration(u), c.y.acceleration(u), c.z.acceleration(u)};
 }
 /** State at u seconds from the segment's reference time. */
-template <class T>
-QUO_LANES_INLINE constexpr StateOf<Vector<T>> orbit_state(const SegmentOf<T>& c, T u) noexcept {
+template <class T, class C = SegmentOf<T>>
+QUO_LANES_INLINE constexpr StateOf<Vector<T>> orbit_state(const C& c, T u) noexcept {
     return {orbit_position(c, u), orbit_velocity(c, u), orbit_acceleration(c, u)};
 }
 
@@ -306,9 +329,8 @@ struct TimeSearchOf {
     QUO_LANES_INLINE static TimeSearchOf begin(T start_s, MaskOf<T> asked) noexcept {
         return {start_s, T{}, T{}, asked, asked, MaskOf<T>{}};
     }
-    template <class V>
-    QUO_LANES_INLINE void step(const SegmentOf<T>& orbit, const V& P, const TimeSpanOf<T>& span,
-                               T range_rate_m_s) noexcept {
+    template <class C, class V>
+    QUO_LANES_INLINE void step(const C& orbit, const V& P, const TimeSpanOf<T>& span, T range_rate_m_s) noexcept {
         const MaskOf<T> inside = both(t_s >= span.first_s, t_s <= span.last_s);
         seen = but_not(seen, but_not(open, inside));
         open = both(open, inside);

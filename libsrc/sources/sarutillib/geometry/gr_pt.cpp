@@ -11,6 +11,7 @@ using quo::Ellipsoid;
 using quo::OrbitState;
 using quo::Vec3;
 
+// Reports name this source so; programs that read them look for it.
 constexpr char kSource[] = R"(..\..\..\libsrc\sources\sarutillib\gr_pt)";
 
 int fail_start(CallerFrame frame, int status) noexcept {

@@ -9,6 +9,7 @@
 #include "quo_base/gen_utils.h"
 #include "quo_base/swath.h"
 #include "quorelxmllib/field_table.h"
+#include "quorelxmllib/guarded.h"
 #include "sarutillib/ground/bounded_text.h"
 
 namespace {
@@ -20,8 +21,8 @@ constexpr const char* kNoPattern = "There is no pattern of that many samples";
 using Obj = AntennaPattern_Obj;
 constexpr quo::FieldTable kTable{
     "AntennaPattern",
-    QUO_FIELD(StartAngle),
-    QUO_FIELD(DeltaAngle),
+    QUO_FIELD(StartAngle, quo::unit("degrees")),
+    QUO_FIELD(DeltaAngle, quo::unit("degrees")),
     QUO_FIELD(PatternSamples, quo::bounds(0, 10000), quo::kOptional),
     QUO_FIELD(Pattern, QUO_LENGTH(PatternSamples), quo::in_memory_only(Obj::kMaxPatternSamples)),
 };
@@ -62,9 +63,10 @@ int Obj::writehdr() {
     if (PatternFile.FileName[0] == '\0') return frame.fail(QUO_REFUSED, "The pattern file has no name");
     PatternFile.NrOfPixelsPerLine = PatternSamples;
     if (const int status = PatternFile.write_hdr()) return frame.callee(status);
-    if (const int status = writehdr((std::string{PatternFile.FileName} + ".hdr").c_str()))
-        return frame.callee(status);
-    return frame.success();
+    return quo::guarded(frame, [&] {
+        const int status = writehdr((std::string{PatternFile.FileName} + ".hdr").c_str());
+        return status == QUO_OK ? frame.success() : frame.callee(status);
+    });
 }
 
 int Obj::readhdr(const char* file) {

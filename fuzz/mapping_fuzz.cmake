@@ -1,0 +1,1 @@
+quo_fuzz(mapping SOURCES mapping_fuzz.cpp COMPONENTS polynomials Coregist)

@@ -1,0 +1,1 @@
+quo_fuzz(product SOURCES product_fuzz.cpp COMPONENTS product)

@@ -1,0 +1,1 @@
+quo_fuzz(raster SOURCES raster_fuzz.cpp COMPONENTS datafile)

@@ -1,0 +1,260 @@
+// What the tool makes of products of a mission, and of one with the lines of a map in it.
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <complex>
+#include <cstdlib>
+#include <functional>
+#include <nlohmann/json.hpp>
+#include <string>
+#include <vector>
+
+#include "quo_base/api.h"
+#include "support/sentinel1.h"
+#include "tool.h"
+
+namespace {
+
+using nlohmann::json;
+
+struct Mission {
+    const char *name, *safe, *wide;
+    std::uint32_t lines;
+    test::Layout layout;
+};
+const Mission kMissions[] = {{"Slc", test::kSlc, "<numberOfSamples>22694<", 4503, test::kPlain},
+                             {"Grd", test::kGrd, "<numberOfSamples>26102<", 16705, test::kDetected}};
+
+/** A product that the tool imported: all lines, of which 30 samples. */
+class Imported : public testing::TestWithParam<Mission> {
+protected:
+    void SetUp() override {
+        const Mission& mission = GetParam();
+        test::Safe safe{folder_, mission.safe};
+        safe.change(mission.wide, "<numberOfSamples>30<");
+        test::write_tiff(safe.measurement(), mission.layout, mission.lines, 30, true);
+        const auto made = test::quo({"import", safe.path(), raster()});
+        ASSERT_EQ(made.exit_status, 0) << made.err;
+    }
+    [[nodiscard]] std::string raster() const { return folder_.file("scene"); }
+    [[nodiscard]] std::string header() const { return raster() + ".hdr"; }
+
+    test::TemporaryFolder folder_;
+};
+
+// Of bursts, whose lines are more than the region's, no less than of an image without. What was cut out of one is
+// as right; headers and rasters that are none of each other's are not.
+TEST_P(Imported, IsRightUntilHeaderAndRasterPart) {
+    EXPECT_EQ(test::quo({"validate", raster()}).out, "0 errors, 0 warnings\n");
+    const std::string part = folder_.file("part");
+    EXPECT_EQ(test::quo({"convert", raster(), part, "--lines", "1400:1600", "--samples", "7:20"}).exit_status, 0);
+    EXPECT_EQ(test::quo({"validate", part}).out, "0 errors, 0 warnings\n");
+
+    const bool bursts = GetParam().safe == test::kSlc;
+    const struct {
+        const char *from, *to, *finding;
+    } kSpoilt[] = {
+        {"<NrOfLinesPerImage>200<", "<NrOfLinesPerImage>199<", "warning  ROI/Lines  "},
+        {"<FirstLine>1400<", "<FirstLine>1300<", "warning  ROI/SlowStartTime  "},
+        {"<FirstSample>7<", "<FirstSample>9<", "warning  ROI/FastStartTime  "},
+        {"<LineStep_s>", "<LineStep_s>x", "error  ImageGrid/-  makes no pixel grid"},
+        {"<LinesPerBurst>1501<", "<LinesPerBurst>501<", "error  ImageGrid/BurstStart_s  places no raster of 200 "},
+        {"<LinesPerBurst>1501<", "<LinesPerBurst>1502<", "warning  SwathInfo/Lines_per_burst  1501, but "},
+    };
+    const std::string whole = test::read_text(part + ".hdr");
+    for (const auto& [from, to, finding] : kSpoilt) {
+        const std::string spoilt = test::replaced(whole, from, to);
+        if (!bursts && spoilt == whole) continue;  // there are none of its lines
+        test::write_text(part + ".hdr", spoilt);
+        EXPECT_NE(test::quo({"validate", part}).out.find(finding), std::string::npos) << from;
+    }
+}
+
+// The ground makes a jump from burst to burst, and where the conversion to ground range changes: control points on
+// both sides of it keep what is between them to half a pixel, over the whole width, and are as few as GDAL can
+// work with.
+TEST_P(Imported, HasControlPointsThatKeepHalfAPixel) {
+    const std::uint32_t samples = GetParam().safe == test::kSlc ? 22694 : 26102;
+    test::write_text(header(), test::replaced(test::read_text(header()), "<NrOfPixelsPerLine>30<",
+                                              "<NrOfPixelsPerLine>" + std::to_string(samples) + "<"));
+    std::filesystem::resize_file(raster(),
+                                 std::uintmax_t{samples} * GetParam().lines * 4);  // a hole, for the most
+    ASSERT_EQ(test::quo({"vrt", raster()}).exit_status, 0);
+    const std::string vrt = test::read_text(raster() + ".vrt");
+    const double most = std::stod(std::string{test::between(vrt, "between them up to ", " pixels off")});
+    EXPECT_GT(most, 0.0);
+    EXPECT_LE(most, 0.5);
+    const auto last = vrt.rfind("<GCP Id=\"");
+    EXPECT_LT(std::stoi(vrt.substr(last + 9)), 1000);
+}
+
+// ---- Items of a catalogue
+
+bool is_time(const json& value) {
+    const std::string text = value.is_string() ? value.get<std::string>() : "";
+    return text.size() > 20 && text[4] == '-' && text[10] == 'T' && text.ends_with('Z');
+}
+bool above_zero(const json& value) { return value.is_number() && value.get<double>() > 0.0; }
+bool is_count(const json& value) { return value.is_number_integer() && value.get<int>() > 0; }
+bool is_angle(const json& value) { return value.is_number() && value >= 0.0 && value <= 90.0; }
+bool is_name(const json& value) { return value.is_string() && !value.get<std::string>().empty(); }
+auto one_of(const json& values) {
+    return [values](const json& value) { return std::ranges::find(values, value) != values.end(); };
+}
+auto equals(const json& expected) {
+    return [expected](const json& value) { return value == expected; };
+}
+auto list_of(const std::function<bool(const json&)>& fits, std::size_t least, std::size_t most) {
+    return [=](const json& value) {
+        return value.is_array() && value.size() >= least && value.size() <= most &&
+               std::ranges::all_of(value, fits);
+    };
+}
+bool is_number(const json& value) { return value.is_number(); }
+
+// What the published schemas of the item and its four extensions require, and the types and words of what they
+// leave free.
+TEST_P(Imported, MakesAnItemThatItsSchemasAllow) {
+    const bool grd = GetParam().safe == test::kGrd;
+    const std::string url = "https://stac-extensions.github.io/";
+    const struct {
+        const char* path;
+        std::function<bool(const json&)> fits;
+    } kRules[] = {
+        {"/stac_version", equals("1.0.0")},
+        {"/type", equals("Feature")},
+        {"/id", is_name},
+        {"/stac_extensions", equals({url + "sar/v1.0.0/schema.json", url + "sat/v1.0.0/schema.json",
+                                     url + "projection/v1.1.0/schema.json", url + "view/v1.0.0/schema.json"})},
+        {"/geometry/type", equals("Polygon")},
+        {"/geometry/coordinates/0", list_of(list_of(is_number, 2, 2), 5, 5)},
+        {"/bbox", list_of(is_number, 4, 4)},
+        {"/links", list_of([](const json&) { return true; }, 0, 0)},
+        {"/assets/header/href", equals("./scene.hdr")},
+        {"/assets/raster/href", equals("./scene")},
+        {"/assets/raster/roles", equals({"data"})},
+        {"/properties/datetime", is_time},
+        {"/properties/start_datetime", is_time},
+        {"/properties/end_datetime", is_time},
+        {"/properties/platform", equals(grd ? "sentinel-1b" : "sentinel-1a")},
+        {"/properties/sar:instrument_mode", equals("IW")},
+        {"/properties/sar:frequency_band", equals("C")},
+        {"/properties/sar:center_frequency", [](const json& f) { return f > 5.4 && f < 5.41; }},
+        {"/properties/sar:polarizations", list_of(one_of({"HH", "VV", "HV", "VH"}), 1, 1)},
+        {"/properties/sar:product_type", equals(grd ? "GRD" : "SLC")},
+        {"/properties/sar:observation_direction", equals("right")},
+        {"/properties/sar:looks_range", is_count},
+        {"/properties/sar:pixel_spacing_range", above_zero},
+        {"/properties/sar:pixel_spacing_azimuth", above_zero},
+        {"/properties/sat:orbit_state", equals(grd ? "descending" : "ascending")},
+        {"/properties/sat:absolute_orbit", equals(grd ? 30148 : 41314)},
+        {"/properties/sat:relative_orbit", is_count},
+        {"/properties/view:incidence_angle", is_angle},
+        {"/properties/view:off_nadir", is_angle},
+        {"/properties/proj:epsg", equals(nullptr)},
+        {"/properties/proj:shape", equals({GetParam().lines, 30})},
+        {"/properties/proj:centroid/lat", is_number},
+        {"/properties/proj:centroid/lon", is_number},
+    };
+    const auto made = test::quo({"stac", raster()});
+    ASSERT_EQ(made.exit_status, 0) << made.err;
+    const json item = json::parse(made.out);
+    for (const auto& [path, fits] : kRules) {
+        const json::json_pointer place{path};
+        ASSERT_TRUE(item.contains(place)) << path;
+        EXPECT_TRUE(fits(item[place])) << path << ": " << item[place];
+    }
+    const auto& centre = item["properties"]["proj:centroid"];
+    const auto& box = item["bbox"];
+    EXPECT_TRUE(box[0] < centre["lon"] && centre["lon"] < box[2]) << box;
+    EXPECT_TRUE(box[1] < centre["lat"] && centre["lat"] < box[3]) << box;
+
+    constexpr struct {
+        const char *field, *value, *missing;
+    } kUntold[] = {{"DataSetInfo/ImageType", "NOT SET", "no image type"},
+                   {"DataSetInfo/Polarization", "NOT_AVAILABLE", "no polarization"},
+                   {"SamplingConstants/fc_hz", "7e8", "no frequency of a radar band"}};
+    for (const auto& [field, value, missing] : kUntold) {
+        const std::string before = test::read_text(header());
+        const std::string name = std::string{field}.substr(std::string{field}.find('/') + 1);
+        const auto from = before.find("<" + name + ">") + name.size() + 2;
+        test::write_text(header(), std::string{before}.replace(from, before.find('<', from) - from, value));
+        const auto refused = test::quo({"stac", raster()});
+        EXPECT_EQ(refused.exit_status, 1) << field;
+        EXPECT_EQ(refused.out, "");
+        EXPECT_NE(refused.err.find(missing), std::string::npos) << refused.err;
+        test::write_text(header(), before);
+    }
+}
+INSTANTIATE_TEST_SUITE_P(Sentinel1, Imported, testing::ValuesIn(kMissions),
+                         [](const auto& test) { return std::string{test.param.name}; });
+
+// ---- On the map
+
+/** A raster that lies on the map: north up, squares of `step_deg`. */
+struct MapImage {
+    static constexpr double kWest_deg = 11.372, kNorth_deg = 41.812, kStep_deg = 0.00004;
+    static constexpr int kColumns = 800, kRows = 1175;  // to 11.404 east and 41.765 north, all of it in the image
+    std::vector<std::complex<float>> samples = std::vector<std::complex<float>>(kColumns * kRows);
+
+    [[nodiscard]] bool bright(double longitude_deg, double latitude_deg) const {
+        const auto column = static_cast<int>((longitude_deg - kWest_deg) / kStep_deg);
+        const auto row = static_cast<int>((kNorth_deg - latitude_deg) / kStep_deg);
+        return std::abs(samples[static_cast<std::size_t>(row * kColumns + column)]) > 1000.0F;
+    }
+};
+
+/** How far the middle of what is bright lies off 0, over 0.002 degrees to either side and all of `along`. */
+double offset(const std::function<bool(double along_deg, double across_deg)>& bright) {
+    double sum = 0.0;
+    int count = 0;
+    for (double along_deg = 0.00202; along_deg < 0.008; along_deg += MapImage::kStep_deg)
+        for (double across_deg = -0.00198; across_deg < 0.002; across_deg += MapImage::kStep_deg)  // centres
+            if (bright(along_deg, across_deg)) {
+                sum += across_deg;
+                ++count;
+            }
+    EXPECT_GT(count, 500);
+    return sum / count;
+}
+
+// The example's image is bright where the map has a line every 0.01 degrees; GDAL knows of the image's geometry
+// what the control points tell it. Their corner for their centre would be half a pixel off.
+TEST(Vrt, PutsTheLinesOfTheMapInTheirPlaces) {
+    if (std::system("gdalwarp --version > /dev/null 2>&1") != 0) GTEST_SKIP() << "GDAL is not installed";
+    const test::TemporaryFolder folder;
+    const std::string raster = folder.file("map.slc"), out = folder.file("map.bin");
+    ASSERT_EQ(test::Child(QUO_COMPLETE_PRODUCT, {test::scene_file("s1a_iw1_slc_20220104_asc.xml"), raster})
+                  .wait()
+                  .exit_status,
+              0);
+    ASSERT_EQ(test::quo({"vrt", raster}).exit_status, 0);
+    const std::string warp = "gdalwarp -q -tps -t_srs EPSG:4326 -te 11.372 41.765 11.404 41.812 -tr 4e-5 4e-5 " +
+                             std::string{"-ot CFloat32 -of ENVI '"} + raster + ".vrt' '" + out + "' 2>&1";
+    ASSERT_EQ(std::system(warp.c_str()), 0);
+    MapImage map;
+    const std::string bytes = test::read_text(out);
+    ASSERT_EQ(bytes.size(), map.samples.size() * sizeof map.samples[0]);
+    std::memcpy(map.samples.data(), bytes.data(), bytes.size());
+
+    constexpr double kLine_deg = 1.26e-4, kSample_deg = 5.0e-5;  // 14.0 m to the north, 4.2 m to the east
+    constexpr double kTolerated = 0.4;                           // pixels
+    for (const double latitude_deg : {41.77, 41.78, 41.79, 41.80})
+        for (const double longitude_deg : {11.38, 11.39}) {
+            const double to_north_deg = offset([&](double along_deg, double across_deg) {
+                return map.bright(longitude_deg + along_deg, latitude_deg + across_deg);
+            });
+            const double to_east_deg = offset([&](double along_deg, double across_deg) {
+                return map.bright(longitude_deg + across_deg, latitude_deg + along_deg);
+            });
+            EXPECT_LT(std::abs(to_north_deg), kTolerated * kLine_deg) << latitude_deg << " " << longitude_deg;
+            EXPECT_LT(std::abs(to_east_deg), kTolerated * kSample_deg) << latitude_deg << " " << longitude_deg;
+        }
+
+    const auto told = test::Child("/bin/sh", {"-c", "gdalinfo '" + raster + ".vrt'"}).wait();
+    for (const char* line : {"ID[\"EPSG\",4979]", "MISSION_ID=SENTINEL-1A", "ORBIT_DIRECTION=ASCENDING",
+                             "ACQUISITION_START_TIME=2022-01-04T17:06:10.601927", "Description = V/V"})
+        EXPECT_NE(told.out.find(line), std::string::npos) << line;
+}
+
+}  // namespace

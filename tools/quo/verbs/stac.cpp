@@ -1,0 +1,184 @@
+#include <charconv>
+#include <cmath>
+#include <filesystem>
+#include <nlohmann/json.hpp>
+#include <set>
+
+#include "commands.h"
+#include "date.h"
+#include "outline.h"
+#include "pixels.h"
+#include "product.h"
+
+namespace tool {
+namespace {
+
+using Json = nlohmann::ordered_json;
+
+// What the extensions of the catalogue's format add to its properties.
+constexpr const char* kExtensions[] = {"https://stac-extensions.github.io/sar/v1.0.0/schema.json",
+                                       "https://stac-extensions.github.io/sat/v1.0.0/schema.json",
+                                       "https://stac-extensions.github.io/projection/v1.1.0/schema.json",
+                                       "https://stac-extensions.github.io/view/v1.0.0/schema.json"};
+
+std::string lower(std::string text) {
+    for (char& c : text)
+        if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
+    return text;
+}
+
+/** The letter of a radar band; empty for a frequency in none. */
+std::string band_of(double frequency_ghz) {
+    constexpr struct {
+        const char* name;
+        double from_ghz, to_ghz;
+    } kBands[] = {{"P", 0.25, 0.5}, {"L", 1.0, 2.0},    {"S", 2.0, 4.0},   {"C", 4.0, 8.0},
+                  {"X", 8.0, 12.0}, {"Ku", 12.0, 18.0}, {"K", 18.0, 26.5}, {"Ka", 26.5, 40.0}};
+    for (const auto& [name, from_ghz, to_ghz] : kBands)
+        if (frequency_ghz >= from_ghz && frequency_ghz < to_ghz) return name;
+    return "";
+}
+
+/** "IW" of the swath "IW1", where swaths are named after their mode, else the mode as the header has it. */
+std::string mode_of(const DataSetInfo_Obj& info) {
+    const std::string_view swath = info.Swath, letters = swath.substr(0, swath.find_first_of("0123456789"));
+    if (letters.size() == 2) return std::string{letters};
+    return is_told(info.AcquisitionMode) ? info.AcquisitionMode : "";
+}
+
+/** The usual name of what the image is, where it has one. */
+std::string type_of(const DataSetInfo_Obj& info) {
+    if (info.IsImageType(DataSetInfo_Obj::dsAzimuthFocused) && info.IsProjection(DataSetInfo_Obj::dsSlantRange))
+        return "SLC";
+    if (info.IsImageType(DataSetInfo_Obj::dsMultilook) && info.IsProjection(DataSetInfo_Obj::dsGroundRange))
+        return "GRD";
+    return is_told(info.ImageType) ? info.ImageType : "";
+}
+
+/** A product as an item of a catalogue. */
+class Item {
+public:
+    Item(const std::string& header, GeneralSAR& product)
+        : header_{header}, product_{product}, pixels_{header, product} {}
+
+    Json make() {
+        const Outline outline = outline_of(header_, product_);
+        const DataSetInfo_Obj& info = product_.dataSetInfo;
+        add_times();
+        if (is_told(info.SensorName)) properties_["platform"] = lower(info.SensorName);
+        add_radar(info);
+        add_orbit(info);
+        add_pixels();
+        const std::string file = std::filesystem::path{header_}.filename().string();
+        return {{"type", "Feature"},
+                {"stac_version", "1.0.0"},
+                {"stac_extensions", kExtensions},
+                {"id", is_told(info.SceneID) ? std::string{info.SceneID} : raster_of(file).value_or(file)},
+                {"geometry", outline.geometry},
+                {"bbox", outline.box},
+                {"properties", properties_},
+                {"links", Json::array()},
+                {"assets", assets(file)}};
+    }
+
+private:
+    std::string required(std::string text, const char* what) const {
+        if (text.empty()) throw Failure(header_ + ": no " + what + ", without which there is no item");
+        return text;
+    }
+
+    void add_times() {
+        ROI_Obj region;
+        if (pixels_.grid().getRegion(&region, pixels_.lines(), pixels_.samples()) != QUO_OK)
+            throw Failure(header_ + ": the pixel grid does not hold the raster");
+        const std::string first = required(iso_text(region.SlowStartTime), "date") + "Z",
+                          last = required(iso_text(last_line_time(region)), "date") + "Z";
+        properties_["datetime"] = first;
+        properties_["start_datetime"] = first;
+        properties_["end_datetime"] = last;
+    }
+
+    void add_radar(const DataSetInfo_Obj& info) {
+        const double frequency_ghz = product_.samplingConstants.fc_hz * 1e-9;
+        std::string polarization = info.Polarization;
+        std::erase(polarization, '/');
+        const bool known = std::set<std::string>{"HH", "VV", "HV", "VH"}.contains(polarization);
+        properties_["sar:instrument_mode"] =
+            required(mode_of(info), "acquisition mode (DataSetInfo/AcquisitionMode)");
+        properties_["sar:frequency_band"] =
+            required(band_of(frequency_ghz), "frequency of a radar band (SamplingConstants/fc_hz)");
+        properties_["sar:center_frequency"] = frequency_ghz;
+        properties_["sar:polarizations"] =
+            Json::array({required(known ? polarization : "", "polarization (DataSetInfo/Polarization)")});
+        properties_["sar:product_type"] = required(type_of(info), "image type (DataSetInfo/ImageType)");
+        properties_["sar:observation_direction"] = info.LookDirection < 0 ? "left" : "right";
+        if (info.RangeLooks > 0) properties_["sar:looks_range"] = info.RangeLooks;
+    }
+
+    void add_orbit(const DataSetInfo_Obj& info) {
+        properties_["sat:orbit_state"] = product_.orbit.isAscending() ? "ascending" : "descending";
+        add_number("sat:absolute_orbit", info.OrbitNumber);
+        add_number("sat:relative_orbit", info.Track);
+    }
+    void add_number(const char* key, const std::string& text) {
+        int number = 0;
+        const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
+        if (error == std::errc{} && end == text.data() + text.size() && number > 0) properties_[key] = number;
+    }
+
+    void add_pixels() {
+        const auto middle = pixels_.geometry(0.5 * (pixels_.lines() - 1), 0.5 * (pixels_.samples() - 1));
+        if (!middle) throw Failure(header_ + ": the orbit sees no ground in the middle of the raster");
+        if (const auto spacing = pixels_.ground_spacing()) {
+            const ImageGrid_Obj& grid = pixels_.grid();
+            properties_["sar:pixel_spacing_range"] =
+                grid.GroundLists > 0 ? grid.GroundStep_m : 0.5 * quo::kLightSpeed * grid.SampleStep_s;
+            properties_["sar:pixel_spacing_azimuth"] = spacing->line_m;
+        }
+        properties_["view:incidence_angle"] = middle->incidence_deg;
+        properties_["view:off_nadir"] = middle->look_deg;
+        properties_["proj:epsg"] = nullptr;  // as it was recorded, on no map
+        properties_["proj:shape"] = {pixels_.lines(), pixels_.samples()};
+        properties_["proj:centroid"] = {{"lat", middle->latitude_deg}, {"lon", middle->longitude_deg}};
+    }
+
+    /** A file beside the item. */
+    static Json asset(const std::string& file, const char* type, const char* role) {
+        std::string reference = "./";
+        for (const char c : file) {
+            constexpr std::string_view kPlain = "-._~", kDigits = "0123456789ABCDEF";
+            const auto byte = static_cast<unsigned char>(c);
+            const bool plain = (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') ||
+                               kPlain.find(c) != kPlain.npos;
+            reference += plain ? std::string{c} : std::string{'%', kDigits[byte / 16], kDigits[byte % 16]};
+        }
+        return {{"href", reference}, {"type", type}, {"roles", Json::array({role})}};
+    }
+    static Json assets(const std::string& file) {
+        Json assets{{"header", asset(file, "application/xml", "metadata")}};
+        if (const auto raster = raster_of(file))
+            assets["raster"] = asset(*raster, "application/octet-stream", "data");
+        return assets;
+    }
+
+    const std::string& header_;
+    GeneralSAR& product_;
+    Pixels pixels_;
+    Json properties_ = Json::object();
+};
+
+int stac(const std::string& header) {
+    GeneralSAR product;
+    read_product(header, product);
+    print_json(Item{header, product}.make());
+    return kFine;
+}
+
+}  // namespace
+
+void add_stac(Command& program) {
+    auto [command, header] = add_verb(program, "stac", "Prints a product as an item of a STAC catalogue", stac);
+    command.needs("HEADER", header, "Product header");
+}
+
+}  // namespace tool
