@@ -3,7 +3,9 @@
 
 #include <atomic>
 #include <memory>
+#include <string>
 #include <string_view>
+#include <vector>
 
 #include "quo_base/api.h"
 #include "quo_base/quorelxml_v2.h"
@@ -190,6 +192,8 @@ public:
     /** The polynomial that bears a name such as "DopplerCentroid-0" in headers; null where there is none. It stays
      * until its list is made anew. */
     const poly* polynomial(std::string_view name) const noexcept;
+    /** The names of all polynomials of the lists, in the order of a header. Throws bad_alloc. */
+    std::vector<std::string> names() const;
 
     std::unique_ptr<polyDC[]> DC;              ///< ndc Doppler centroids
     std::unique_ptr<polyFR[]> FR;              ///< nfr FM rates

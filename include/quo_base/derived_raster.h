@@ -5,7 +5,8 @@
 #include "quo_base/datafile.h"
 
 /** @file
- * Rasters that are made of others: cuts and other samplings, which keep the product's description and geometry. */
+ * Rasters that are made of others: cuts and other samplings, which keep the product's description and geometry.
+ * Any number of threads may call at a time, with objects and files of their own. */
 
 #ifdef __cplusplus
 

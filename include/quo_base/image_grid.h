@@ -17,9 +17,9 @@ class ROI_Obj;
  * and every pixel reaches half a line and half a sample to either side. Azimuth times are zero-Doppler times in
  * seconds since 1985, as the orbit takes them; range times are two-way, in seconds.
  *
- * Statuses: 0; 1 for a grid that makes no image (isComplete()), for a missing array or one that no memory can
- * hold; nothing is written then. One object serves one thread at a time; its `const` members may run side by
- * side. */
+ * Statuses: 0; 1 for a grid that makes no image (isComplete()), for a missing array, for arrays that no memory can
+ * hold or that overlap (an output may be the very array of an input); nothing is written then. One object serves
+ * one thread at a time; its `const` members may run side by side. */
 
 /** Pixels: arrays of `count` numbers each. */
 struct ImagePixels {

@@ -6,7 +6,8 @@
 QUO_BASE_C_BEGIN
 
 /** @file
- * Products as missions deliver them, taken over as products of this library: a raster and its header beside it. */
+ * Products as missions deliver them, taken over as products of this library: a raster and its header beside it.
+ * Any number of threads may call at a time, for rasters of their own. */
 
 /** What to take over, and where to. Texts that are null or empty are not given. */
 typedef struct quo_import_request {

@@ -111,8 +111,9 @@ QUO_BASE_API int quo_product_text(const quo_product* product, const char* field,
  * @param[out] look_deg       angle at the platform from the direction to the Earth's centre
  * @param[out] fm_rate_hz_s   azimuth FM rate, Hz/s, negative at broadside
  * @param[out] speed_m_s      platform speed over the rotating Earth
- * @param[out] status         of each sample: 0; 1 for a value that is not finite; 10 where no ground is seen
- * @return 1 also where the header does not tell the look side */
+ * @param[out] status         of each sample: 0; 1 for a value that is not finite, or a range or height that
+ *                            cannot be; 10 where no ground is seen
+ * @return 1 also for a header without the data set, which tells the look side: right where it leaves it open */
 QUO_BASE_API int quo_product_to_ground(const quo_product* product, size_t count, const double* azimuth_s,
                                        const double* range_s, const double* doppler_hz, const double* height_m,
                                        double* latitude_deg, double* longitude_deg, double* ground_height_m,
@@ -170,7 +171,7 @@ QUO_BASE_API int quo_product_times_to_pixels(const quo_product* product, size_t 
  * @param[out] latitude_deg, longitude_deg, ground_height_m, x_m, y_m, z_m, incidence_deg, look_deg  as
  *                            quo_product_to_ground()
  * @param[out] status         of each pixel: 0; 1 for one without times; 10 where no ground is seen
- * @return 1 also without an orbit or where the header does not tell the look side */
+ * @return 1 also without an orbit, or the data set that tells the look side */
 QUO_BASE_API int quo_product_pixels_to_ground(const quo_product* product, size_t count, const double* line,
                                               const double* sample, const double* height_m, double* latitude_deg,
                                               double* longitude_deg, double* ground_height_m, double* x_m,

@@ -38,6 +38,14 @@ private:
     int32_t error_number_ = 0;
 };
 
+/** An ERROR entry, as the report shows it. Texts are cut to their room. */
+struct quorelReportEntry {
+    char message[512];   ///< empty where there is no entry
+    char function[128];  ///< that made it
+    char file[128];      ///< its source
+    int32_t line;        ///< its line there
+};
+
 /** Writes report and log entries with printf-style formatting; messages are cut at 2047 bytes.
  *
  * The report is opened once: by setReportName(), by the constructor that names it, or by setLevel() after a name
@@ -61,6 +69,9 @@ public:
     void addEntry(const char* format, ...) noexcept QUO_PRINTF_LIKE(2, 3);
     /** An entry of the given kind, at line 0 of "UNKNOWN". */
     void addEntry(int kind, const char* format, ...) noexcept QUO_PRINTF_LIKE(3, 4);
+    /** The latest ERROR entry that this thread has made since this was asked before, whether or not a report is
+     * open: ask once before a call, to forget what is older, and again when it has failed. */
+    static quorelReportEntry takeError() noexcept;
     /** A WARNING entry "errno N (TEXT)" when errno is not 0; clears errno. */
     static void checkErrno(int line, const char* function, const char* file) noexcept;
     /** A CHECKPOINT entry "End of processing". The report stays open. */

@@ -2,6 +2,8 @@
 #include "support/session.h"
 
 #include <ctime>
+#include <thread>
+#include <tuple>
 
 #include "quo_base/ckerr.h"
 #include "quo_base/quorelReport.h"
@@ -140,6 +142,18 @@ TEST(Texts, LongMessagesStayWholeTitlesAndFormattedOnesAreCut) {
     EXPECT_THAT(report.text(), testing::HasSubstr(" - " + std::string(4095, 'x') + " - "));
     EXPECT_EQ(report.entries()[0].message, endless);
     EXPECT_EQ(report.entries()[1].message, std::string(2047, 'x'));
+}
+
+TEST(TakenErrors, AreTheThreadsLatestWhetherOrNotAReportIsOpen) {
+    quo_add_report("first", QUO_ERROR, 17, "f()", "f.c");
+    quo_add_report("second", QUO_ERROR, 18, "g()", "g.c");
+    quo_add_report("neither", QUO_ERROR_CALL_TREE, 19, "h()", "h.c");
+    std::thread{[] { EXPECT_STREQ(quorelReport::takeError().message, ""); }}.join();
+    const quorelReportEntry taken = quorelReport::takeError();
+    EXPECT_EQ((std::tuple<std::string, std::string, std::string, int>{taken.message, taken.function, taken.file,
+                                                                      taken.line}),
+              (std::tuple{"second", "g()", "g.c", 18}));
+    EXPECT_STREQ(quorelReport::takeError().message, "");
 }
 
 TEST(QuorelException, KeepsMessageAndPositionUpTo511Bytes) {

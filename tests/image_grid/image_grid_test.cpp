@@ -144,6 +144,9 @@ TEST(ImageGrid, RefusesWhatMakesNoImage) {
     EXPECT_EQ(grid.FirstLine_s, 0.25);
     EXPECT_EQ(grid.pixelTimes({1, nullptr, &number}, {&out}), 1);
     EXPECT_EQ(grid.timePixels({1, &number, nullptr}, {&out}), 1);
+    double both[] = {0.0, 1.0, 7.0};
+    EXPECT_EQ(grid.pixelTimes({2, both, both}, {both + 1}), 1);
+    EXPECT_EQ(grid.pixelTimes({2, both, both}, {nullptr, both}), 0);  // an input's very array may be one
     EXPECT_EQ(out, 7.0);
     EXPECT_EQ(grid.pixelTimes({0, nullptr, nullptr}, {}), 0);
     std::int32_t status = 0;

@@ -35,8 +35,9 @@ constexpr std::size_t bytes_of(MeasuredType type) {
 }
 
 /** The only exported function of the module that holds libtiff. Null, with the reason in `why`, which has room for
- * `room` bytes, for a file that is no such image. */
-using MeasurementEntry = Measurement* (*)(const char* file, char* why, std::size_t room);
+ * `room` bytes, for a file that is no such image, and in a module of another version, whose class may differ. */
+using MeasurementEntry = Measurement* (*)(int version, const char* file, char* why, std::size_t room);
+inline constexpr int kMeasurementVersion = 1;
 inline constexpr const char* kMeasurementEntryName = "quo_base_open_measurement";
 
 }  // namespace quo

@@ -61,7 +61,8 @@ MeasurementEntry measurement_entry() {
 
 std::unique_ptr<Measurement> open_measurement(const std::string& file, const Sentinel1Product& product) {
     char why[256] = "";
-    std::unique_ptr<Measurement> measurement{measurement_entry()(file.c_str(), why, sizeof why)};
+    std::unique_ptr<Measurement> measurement{
+        measurement_entry()(kMeasurementVersion, file.c_str(), why, sizeof why)};
     errno = 0;
     if (!measurement) refuse(QUO_REFUSED, file + ": " + why);
     if (measurement->lines != product.lines || measurement->samples != product.samples)

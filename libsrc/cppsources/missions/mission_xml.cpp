@@ -10,6 +10,7 @@
 #include <limits>
 
 #include "quo_base/api.h"
+#include "quorelxmllib/header_source.h"
 #include "sarutillib/ground/file_io.h"
 #include "sarutillib/ground/number_text.h"
 
@@ -55,15 +56,16 @@ MissionXml::MissionXml(const std::string& file) : name_{file}, document_{nullptr
     if (*bytes > kMostBytes) throw MissionRefusal{QUO_REFUSED, file + ": is too long for a product's description"};
     // By its bytes: a name would be read as an address, and what is compressed would be unpacked without a bound.
     const auto text = read_file(file.c_str(), kMostBytes);
-    if (!text) throw MissionRefusal{QUO_READ_FAILED, file + ": cannot be read"};
+    if (!text) throw MissionRefusal{errno == ENOMEM ? QUO_NO_MEMORY : QUO_READ_FAILED, file + ": cannot be read"};
+    const XmlErrors errors;
     xmlDoc* const document = xmlReadMemory(text->data(), static_cast<int>(text->size()), nullptr, nullptr,
-                                           XML_PARSE_NONET | XML_PARSE_NOBLANKS | XML_PARSE_COMPACT |
-                                               XML_PARSE_NOERROR | XML_PARSE_NOWARNING | XML_PARSE_NOCDATA);
+                                           kHeaderOptions | XML_PARSE_NOCDATA);
     errno = 0;
     document_ = document;
-    if (!document || !xmlDocGetRootElement(document) || document->intSubset) {
+    if (errors.out_of_memory() || !document || !xmlDocGetRootElement(document) || document->intSubset) {
         xmlFreeDoc(document);
-        throw MissionRefusal{QUO_REFUSED, file + ": is no XML file that can be read"};
+        throw MissionRefusal{errors.out_of_memory() ? QUO_NO_MEMORY : QUO_REFUSED,
+                             file + ": is no XML file that can be read"};
     }
 }
 

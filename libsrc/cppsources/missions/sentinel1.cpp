@@ -4,7 +4,6 @@
 #include <array>
 #include <cmath>
 #include <functional>
-#include <numbers>
 #include <span>
 #include <vector>
 
@@ -101,6 +100,7 @@ void set_sampling(const Annotation& a, GeneralSAR& product) {
     sampling.Brg_hz = range.number("processingBandwidth");
     sampling.Baz_hz = azimuth.number("processingBandwidth");
     sampling.pri_s = downlink.number("pri");
+    if (!(sampling.pri_s > 0.0)) a.general.refuse("the pulse repetition interval is not above 0");
     sampling.prf_hz = 1.0 / sampling.pri_s;
     const auto bursts = a.bursts();
     if (bursts.size() > 1) {
@@ -108,6 +108,7 @@ void set_sampling(const Annotation& a, GeneralSAR& product) {
         sampling.bri_s = (bursts.back().time("azimuthTime").after(first_s) -
                           bursts.front().time("azimuthTime").after(first_s)) /
                          static_cast<double>(bursts.size() - 1);
+        if (!(sampling.bri_s > 0.0)) a.general.refuse("the bursts do not follow each other");
         sampling.brf_hz = 1.0 / sampling.bri_s;
     }
     product.orbit.setLambda(sampling.lambda_m);
@@ -360,8 +361,8 @@ void set_attitude(const Annotation& a, const ImageGrid_Obj& grid, GeneralSAR& pr
     attitude.Eq_speed = std::sqrt(0.5 * std::abs(at.fm_rate_hz_s) * lambda_m * distance_m);
     if (product.polynomials.ndc > 0) {
         attitude.Mean_DC = product.polynomials.EvaluateDC(range_s, azimuth_s);
-        attitude.SquintAngle = std::asin(std::clamp(0.5 * lambda_m * attitude.Mean_DC / at.speed_m_s, -1.0, 1.0)) *
-                               180.0 / std::numbers::pi;
+        attitude.SquintAngle =
+            std::asin(std::clamp(0.5 * lambda_m * attitude.Mean_DC / at.speed_m_s, -1.0, 1.0)) * kDegPerRad;
     }
     product.GSenable(gsSensorAttitude);
 }

@@ -176,8 +176,12 @@ private:
 
 }  // namespace
 
-extern "C" QUO_BASE_API quo::Measurement* quo_base_open_measurement(const char* file, char* why,
+extern "C" QUO_BASE_API quo::Measurement* quo_base_open_measurement(int version, const char* file, char* why,
                                                                     std::size_t room) {
+    if (version != quo::kMeasurementVersion) {
+        std::snprintf(why, room, "the module that reads it belongs to another version of the library");
+        return nullptr;
+    }
     try {
         auto measurement = std::make_unique<TiffMeasurement>(file);
         const char* const defect = measurement->examine();

@@ -12,6 +12,7 @@
 #include "diagnosticslib/call_stack.h"
 #include "diagnosticslib/errno_kept.h"
 #include "quo_base/ckerr.h"
+#include "quo_base/quorelReport.h"
 #include "sarutillib/ground/bounded_text.h"
 
 namespace {
@@ -32,6 +33,9 @@ struct Channel {
 
 std::mutex writing;
 Channel report, log_file;
+
+// What each thread reported last, for the exceptions of other languages: they come before anybody opens a report.
+thread_local quorelReportEntry latest_error;
 
 // Report and log tell of one run and share its title and start time: opening the log after the report moves the
 // origin of the report's elapsed times and replaces the title of its closing banner.
@@ -116,6 +120,13 @@ struct Entry {
     const char *function, *file;
 };
 
+void keep_error(const Entry& entry) noexcept {
+    quo::copy_bounded(latest_error.message, entry.message);
+    quo::copy_bounded(latest_error.function, entry.function);
+    quo::copy_bounded(latest_error.file, entry.file);
+    latest_error.line = entry.line;
+}
+
 void write_entry(std::FILE* stream, int number, const Entry& entry) noexcept {
     const int elapsed_s = static_cast<int>(std::time(nullptr) - shared_start);
     if (entry.kind == QUO_ERROR) {
@@ -169,11 +180,13 @@ extern "C" int set_flg_report(int level) noexcept { return report.level = level;
 
 extern "C" void quo_add_report(const char* message, int kind, int line, const char* function,
                                const char* file) noexcept {
-    if (!report.is_open() || quo::call_stack().muted > 0) return;
+    if (quo::call_stack().muted > 0) return;
     const quo::ErrnoKept kept;
-    const std::lock_guard guard{writing};
-    if (!report.is_open()) return;  // closed by another thread meanwhile
     const Entry entry{shown(message), kind, line, shown(function), shown(file)};
+    if (kind == QUO_ERROR) keep_error(entry);
+    if (!report.is_open()) return;
+    const std::lock_guard guard{writing};
+    if (!report.is_open()) return;                                         // closed by another thread meanwhile
     if (report.stream) write_entry(report.stream, report.entries, entry);  // none behind a level that was forced
     if (kind == QUO_ERROR || kind == QUO_MESSAGE) {
         std::fprintf(stderr, "MSG_%s: %s.\n", name_of(kind), entry.message);
@@ -196,5 +209,7 @@ extern "C" void quo_check(int error_number, int line, const char* function, cons
     const quo::ErrnoKept kept;
     quo_add_report(std::strerror(error_number), QUO_ERROR, line, function, file);
 }
+
+quorelReportEntry quorelReport::takeError() noexcept { return std::exchange(latest_error, {}); }
 
 extern "C" int quo_take_system_error(void) noexcept { return std::exchange(quo::call_stack().system_error, 0); }

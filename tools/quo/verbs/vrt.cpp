@@ -2,7 +2,6 @@
 #include <array>
 #include <cmath>
 #include <filesystem>
-#include <numbers>
 #include <optional>
 #include <vector>
 
@@ -38,7 +37,7 @@ Control between(const Control& a, const Control& b) {
 }
 /** Degrees of latitude between two places on the ground. */
 double distance(const Control& a, const Control& b) {
-    const double shrink = std::cos(a.latitude_deg * std::numbers::pi / 180.0);
+    const double shrink = std::cos(a.latitude_deg / quo::kDegPerRad);
     return std::hypot(a.latitude_deg - b.latitude_deg, (a.longitude_deg - b.longitude_deg) * shrink);
 }
 

@@ -112,7 +112,8 @@ int commit_derived(BufferFile& raster, const char* header, const RasterDerivatio
         const auto product = std::make_unique<GeneralSAR>();
         const quo::HeaderSession source{header};
         // A product of which a part was lost on the way would be made to fit in a part only.
-        if (product->GSread(header) != QUO_OK || source.failures() > 0) return frame.callee(QUO_REFUSED);
+        if (const int read = product->GSread(header)) return frame.callee(read);
+        if (source.failures() > 0) return frame.callee(QUO_REFUSED);
         const quo::HeaderSession session{own.c_str(), header};
         const int placed = Placed{*product, raster, how}.write(header, own.c_str());
         if (placed != QUO_OK) return frame.callee(placed);

@@ -5,18 +5,19 @@
 #include <limits>
 #include <new>
 #include <optional>
+#include <span>
 #include <type_traits>
 
 #include "diagnosticslib/call_frame.h"
 #include "quo_base/geometry.h"
 #include "quo_base/roi.h"
 #include "quorelxmllib/field_table.h"
+#include "sarutillib/ground/array_extents.h"
 
 namespace {
 
 constexpr const char* kSource = "image_grid";
 constexpr const char* kNoGrid = "The grid makes no image";
-constexpr const char* kNoArrays = "An array is missing";
 constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
 constexpr double kAbsent = -999.0;  // of the first element, which is read before any other
 
@@ -138,6 +139,14 @@ void put(T* array, std::size_t i, std::type_identity_t<T> value) {
     if (array) array[i] = value;
 }
 
+/** What keeps a grid from turning arrays into others; null where nothing does. */
+const char* defect_of(const Obj& grid, std::span<const double* const> inputs, std::span<double* const> outputs,
+                      const std::int32_t* status, std::size_t count) noexcept {
+    if (!grid.isComplete()) return kNoGrid;
+    if (count > 0 && std::ranges::find(inputs, nullptr) != inputs.end()) return "An array is missing";
+    return quo::lie_well(inputs, outputs, status, count) ? nullptr : "Arrays overlap, or no memory can hold them";
+}
+
 }  // namespace
 
 QUO_RECORD(ImageGrid_Obj, kTable)
@@ -219,9 +228,11 @@ bool Obj::isComplete() const {
 }
 
 int Obj::pixelTimes(const ImagePixels& pixels, const PixelTimes& times) const noexcept {
-    if (!isComplete() || (pixels.count > 0 && (!pixels.line || !pixels.sample))) {
+    const double* const inputs[] = {pixels.line, pixels.sample};
+    double* const outputs[] = {times.azimuth_s, times.range_s};
+    if (const char* const defect = defect_of(*this, inputs, outputs, times.status, pixels.count)) {
         quo::CallFrame frame{"ImageGrid_Obj::pixelTimes", kSource};
-        return frame.fail(QUO_REFUSED, isComplete() ? kNoArrays : kNoGrid);
+        return frame.fail(QUO_REFUSED, defect);
     }
     const Axes axes{*this};
     for (std::size_t i = 0; i < pixels.count; ++i) {
@@ -237,9 +248,11 @@ int Obj::pixelTimes(const ImagePixels& pixels, const PixelTimes& times) const no
 }
 
 int Obj::timePixels(const ImageTimes& times, const TimePixels& pixels) const noexcept {
-    if (!isComplete() || (times.count > 0 && (!times.azimuth_s || !times.range_s))) {
+    const double* const inputs[] = {times.azimuth_s, times.range_s};
+    double* const outputs[] = {pixels.line, pixels.second_line, pixels.sample};
+    if (const char* const defect = defect_of(*this, inputs, outputs, pixels.status, times.count)) {
         quo::CallFrame frame{"ImageGrid_Obj::timePixels", kSource};
-        return frame.fail(QUO_REFUSED, isComplete() ? kNoArrays : kNoGrid);
+        return frame.fail(QUO_REFUSED, defect);
     }
     const Axes axes{*this};
     for (std::size_t i = 0; i < times.count; ++i) {

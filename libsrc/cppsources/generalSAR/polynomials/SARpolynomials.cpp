@@ -238,13 +238,18 @@ bool make_lists(polySAR& set, const Counts& wanted) {
            }) == QUO_OK;
 }
 
+/** The name in a header of the i-th polynomial of a list. */
+std::string name_in_header(std::size_t list, std::int32_t i) {
+    return std::string{kQuantities[list].file_name} + '-' + std::to_string(i);
+}
+
 /** Calls `use(polynomial, name)` for every polynomial with its name in a header, until it returns a status other
  * than 0. */
 template <typename Use>
 int each_polynomial(polySAR& set, Use use) {
     return each_list([&](std::size_t index, auto list, auto count) {
         for (std::int32_t i = 0; i < set.*count; ++i) {
-            const std::string name = std::string{kQuantities[index].file_name} + '-' + std::to_string(i);
+            const std::string name = name_in_header(index, i);
             if (const int status = use((set.*list)[static_cast<std::size_t>(i)], name.c_str())) return status;
         }
         return 0;
@@ -351,6 +356,14 @@ const poly* polySAR::polynomial(std::string_view name) const noexcept {
         return QUO_OK;
     });
     return found;
+}
+
+std::vector<std::string> polySAR::names() const {
+    std::vector<std::string> names;
+    const Counts counts = counts_of(*this);
+    for (std::size_t list = 0; list < counts.size(); ++list)
+        for (std::int32_t i = 0; i < counts[list]; ++i) names.push_back(name_in_header(list, i));
+    return names;
 }
 
 int polySAR::CreatePolys(int dc, int fr, int sl2gr, int gr2sl, int sl2theta, int sl2phi) {

@@ -60,9 +60,10 @@ int finish(quo::CallFrame& frame, int status) { return status ? frame.callee(sta
 /** Takes over the raster that the header describes, if it does. */
 int take_described_raster(OpenProduct& product) {
     const RasterDescription* const described = described_raster(product.header);
-    if (!described) return QUO_OK;
+    const char* const name = product.header.dataFile.File.FileName;  // of the header's name, in any form
+    if (!described || *name == '\0') return QUO_OK;
     product.raster.copyDescription(*described);
-    return product.raster.setFilename(product.header.dataFile.File.FileName);  // of the header's name, in any form
+    return product.raster.setFilename(name);
 }
 
 bool has_raster(const OpenProduct& product) { return product.raster.FileName[0] != '\0'; }

@@ -1,0 +1,320 @@
+"""Maps under geocode(): their grids, the terrain, and what the radar sees of it."""
+
+from __future__ import annotations
+
+import os
+from typing import Any, NamedTuple, Optional
+
+import numpy as np
+
+RESAMPLINGS = ("nearest", "bilinear", "sinc")
+_HEIGHTS = {"ellipsoid": None, "egm96": "EPSG:4326+5773", "egm2008": "EPSG:4326+3855"}
+_SINC = 8  # samples each way
+# Arithmetic of WGS84, m.
+_A, _B = 6378137.0, 6356752.314245179
+
+
+def _horizontal(crs: Any) -> str:
+    """A reference system without its heights, as text."""
+    from pyproj import CRS
+
+    whole = CRS.from_user_input(crs)
+    return (whole.sub_crs_list[0] if whole.is_compound else whole).to_wkt()
+
+
+def _transformer(source: Any, target: Any) -> Any:
+    from pyproj import Transformer
+
+    return Transformer.from_crs(source, target, always_xy=True)
+
+
+class Terrain(NamedTuple):
+    """An elevation model by its file, and what its heights stand on."""
+
+    path: str
+    crs: str
+    transform: tuple[float, ...]
+    shape: tuple[int, int]
+    nodata: Optional[float]
+    geoid: Optional[str]
+
+    @classmethod
+    def of(cls, path: Any, heights: Optional[str]) -> Terrain:
+        import rasterio
+
+        if heights is not None and heights not in _HEIGHTS:
+            raise ValueError(f"heights stand on one of {', '.join(_HEIGHTS)}, not {heights!r}")
+        with rasterio.open(os.fspath(path)) as file:
+            if file.crs is None:
+                raise ValueError(f"{path}: has no coordinate reference system")
+            geoid = _geoid_of(path, file.crs, heights)
+            made = cls(os.fspath(path), _horizontal(file.crs.to_wkt()), tuple(file.transform)[:6], file.shape, file.nodata, geoid)
+        made._to_ellipsoid()
+        return made
+
+    def _to_ellipsoid(self) -> Any:
+        """From the geoid's heights to the ellipsoid's; refused where the geoid's grid is not installed."""
+        from pyproj.transformer import TransformerGroup
+
+        if self.geoid is None:
+            return None
+        group = TransformerGroup(self.geoid, "EPSG:4979", always_xy=True)
+        if not group.transformers or not group.best_available:
+            missing = ", ".join(grid.short_name for op in group.unavailable_operations for grid in op.grids)
+            raise ValueError(f"heights above {self.geoid} need a geoid grid that is not installed: {missing}")
+        return group.transformers[0]
+
+    def heights(self, longitude: np.ndarray, latitude: np.ndarray) -> np.ndarray:
+        """Heights above the ellipsoid at places, bilinear; not-a-number beyond the model and beside its gaps."""
+        import rasterio
+        from rasterio.windows import Window
+
+        x, y = _transformer("EPSG:4326", self.crs).transform(longitude, latitude)
+        a, b, c, d, e, f = self.transform
+        # Centres of pixels have whole numbers.
+        determinant = a * e - b * d
+        column = (e * (x - c) - b * (y - f)) / determinant - 0.5
+        row = (a * (y - f) - d * (x - c)) / determinant - 0.5
+        window = _window(row, column, self.shape, 1)
+        if window is None:
+            return np.full(np.shape(longitude), np.nan)
+        first_row, rows, first_column, columns = window
+        with rasterio.open(self.path) as file:
+            block = file.read(1, window=Window(first_column, first_row, columns, rows)).astype(np.float64)
+        if self.nodata is not None:
+            block[block == self.nodata] = np.nan
+        made = _bilinear(block, row - first_row, column - first_column)
+        geoid = self._to_ellipsoid()
+        return made if geoid is None else geoid.transform(longitude, latitude, made)[2]
+
+
+def _geoid_of(path: Any, crs: Any, heights: Optional[str]) -> Optional[str]:
+    """What the heights stand on: what the file names, or what is told; the two must agree."""
+    from pyproj import CRS
+
+    whole = CRS.from_wkt(crs.to_wkt())
+    vertical = [part.to_authority() for part in whole.sub_crs_list if part.is_vertical]
+    named = "+".join(["EPSG:4326", vertical[0][1]]) if vertical and vertical[0] else None
+    if heights is None and not vertical:
+        raise ValueError(f"{path} does not name what its heights stand on: heights={' or '.join(map(repr, _HEIGHTS))}")
+    if heights is None and named is None:
+        raise ValueError(f"{path}: its heights stand on {whole.sub_crs_list[-1].name}, which is not known here")
+    if heights is not None and vertical and named != _HEIGHTS[heights]:
+        raise ValueError(f"{path}: its heights stand on {whole.sub_crs_list[-1].name}, not on {heights!r}")
+    return named if heights is None else _HEIGHTS[heights]
+
+
+class MapGrid(NamedTuple):
+    """A map: its reference system, where its pixels stand, and how many there are."""
+
+    crs: str
+    transform: tuple[float, ...]
+    shape: tuple[int, int]
+    pixel_m: float
+
+    @classmethod
+    def over(cls, product: Any, terrain: Terrain, crs: Any, spacing: Optional[float]) -> MapGrid:
+        """The part of the model's grid, or of a wanted one, that the image may reach."""
+        wanted = terrain.crs if crs is None else _horizontal(crs)
+        x, y = _transformer("EPSG:4326", wanted).transform(*_outline(product, terrain))
+        if crs is None and spacing is None:
+            transform = terrain.transform
+        else:
+            step = _spacing_of(terrain, wanted) if spacing is None else float(spacing)
+            transform = (step, 0.0, step * np.floor(np.min(x) / step), 0.0, -step, step * np.ceil(np.max(y) / step))
+        return cls._around(wanted, transform, x, y, terrain if crs is None and spacing is None else None)
+
+    @classmethod
+    def _around(cls, crs: str, transform: Any, x: np.ndarray, y: np.ndarray, limit: Optional[Terrain]) -> MapGrid:
+        a, _, c, _, e, f = transform
+        columns, rows = (np.sort([np.min(v), np.max(v)]) for v in ((x - c) / a, (y - f) / e))
+        first = np.floor([rows[0], columns[0]]).astype(int)
+        last = np.ceil([rows[1], columns[1]]).astype(int)
+        if limit is not None:
+            first, last = np.maximum(first, 0), np.minimum(last, limit.shape)
+        if (last <= first).any():
+            raise ValueError("the elevation model and the image have no place in common")
+        moved = (a, 0.0, c + a * first[1], 0.0, e, f + e * first[0])
+        return cls(crs, moved, (int(last[0] - first[0]), int(last[1] - first[1])), _pixel_m(crs, moved, last - first))
+
+    def axes(self) -> tuple[np.ndarray, np.ndarray]:
+        """Coordinates of the pixels' centres: x of the columns, y of the rows."""
+        a, _, c, _, e, f = self.transform
+        return c + a * (np.arange(self.shape[1]) + 0.5), f + e * (np.arange(self.shape[0]) + 0.5)
+
+    def places(self, row: int, column: int, rows: int, columns: int) -> tuple[np.ndarray, np.ndarray]:
+        """Longitudes and latitudes of pixels, degrees; the place may lie beside the map."""
+        a, _, c, _, e, f = self.transform
+        x, y = np.meshgrid(c + a * (column + np.arange(columns) + 0.5), f + e * (row + np.arange(rows) + 0.5))
+        return _transformer(self.crs, "EPSG:4326").transform(x, y)
+
+
+def _outline(product: Any, terrain: Terrain) -> tuple[np.ndarray, np.ndarray]:
+    """Places all around the part of the model that the image may show, and within: longitudes and latitudes.
+
+    The image's edges are looked for at the lowest and the highest ground of the Earth, so that no terrain is cut.
+    """
+    lines, samples = product.raster.shape
+    line, sample = np.meshgrid(np.linspace(-1, lines, 33), np.linspace(-1, samples, 33), indexing="ij")
+    times = product.grid.times(line, sample)
+    places = [product.orbit.to_ground(times.azimuth_time, times.range_time, None, h) for h in (-500.0, 9000.0)]
+    longitude = np.concatenate([np.ravel(each.longitude) for each in places])
+    latitude = np.concatenate([np.ravel(each.latitude) for each in places])
+    known = np.isfinite(longitude)
+    if not known.any():
+        raise ValueError("the image has no place on the ground")
+    a, _, c, _, e, f = terrain.transform
+    u, v = np.meshgrid(np.linspace(0, terrain.shape[1], 33), np.linspace(0, terrain.shape[0], 33))
+    east, north = _transformer(terrain.crs, "EPSG:4326").transform(c + a * u, f + e * v)
+    west, south = max(longitude[known].min(), east.min()), max(latitude[known].min(), north.min())
+    to_east, to_north = min(longitude[known].max(), east.max()), min(latitude[known].max(), north.max())
+    if to_east <= west or to_north <= south:
+        raise ValueError("the elevation model and the image have no place in common")
+    outline = np.meshgrid(np.linspace(west, to_east, 17), np.linspace(south, to_north, 17))
+    return outline[0], outline[1]
+
+
+def _spacing_of(terrain: Terrain, crs: str) -> float:
+    """The model's spacing in units of another reference system, at its middle."""
+    a, _, c, _, e, f = terrain.transform
+    x, y = c + a * terrain.shape[1] / 2, f + e * terrain.shape[0] / 2
+    there = _transformer(terrain.crs, crs)
+    one, other = there.transform(x, y), there.transform(x, y + e)
+    return float(np.hypot(other[0] - one[0], other[1] - one[1]))
+
+
+def _pixel_m(crs: str, transform: Any, shape: Any) -> float:
+    """Length of the shorter side of a pixel in the middle of a map, m."""
+    a, _, c, _, e, f = transform
+    x, y = c + a * shape[1] / 2, f + e * shape[0] / 2
+    longitude, latitude = _transformer(crs, "EPSG:4326").transform(np.array([x, x + a, x]), np.array([y, y, y + e]))
+    corner, east, north = earth_fixed(latitude, longitude, np.zeros(3))
+    return float(min(np.linalg.norm(east - corner), np.linalg.norm(north - corner)))
+
+
+# --- Samples at places between them -------------------------------------------------------------------------------
+
+
+def _window(row: Any, column: Any, shape: tuple[int, int], margin: int) -> Optional[tuple[int, int, int, int]]:
+    """First row, rows, first column, columns of what places within a raster need; None where none is within."""
+    within = (row > -1.0) & (row < shape[0]) & (column > -1.0) & (column < shape[1])
+    if not np.any(within):
+        return None
+    first = [max(int(np.floor(v[within].min())) - margin, 0) for v in (row, column)]
+    last = [min(int(np.floor(v[within].max())) + margin + 2, n) for v, n in zip((row, column), shape)]
+    return first[0], last[0] - first[0], first[1], last[1] - first[1]
+
+
+def _taken(block: np.ndarray, row: np.ndarray, column: np.ndarray) -> tuple[np.ndarray, np.ndarray]:
+    """Values at whole places, with those at the border going on beyond it, and which of them are within."""
+    within = (row >= 0) & (row < block.shape[0]) & (column >= 0) & (column < block.shape[1])
+    values = block[np.clip(row, 0, block.shape[0] - 1), np.clip(column, 0, block.shape[1] - 1)]
+    return values, within
+
+
+def _nearest(block: np.ndarray, row: np.ndarray, column: np.ndarray) -> np.ndarray:
+    known = np.isfinite(row) & np.isfinite(column)
+    places = [np.floor(np.where(known, v, -1.0) + 0.5).astype(np.int64) for v in (row, column)]
+    values, within = _taken(block, *places)
+    return np.where(known & within, values, np.nan)
+
+
+def _weighted(block: np.ndarray, row: np.ndarray, column: np.ndarray, taps: int, weight: Any) -> np.ndarray:
+    """Sum over taps x taps neighbours by the product of their weights, which are made to have the sum 1. Places
+    within half a pixel of the border take its values as going on; beyond there are none."""
+    edge = [np.isfinite(v) & (v >= -0.5) & (v <= n - 0.5) for v, n in zip((row, column), block.shape)]
+    known = edge[0] & edge[1]
+    row, column = np.where(known, row, 0.0), np.where(known, column, 0.0)
+    whole = [np.floor(v).astype(np.int64) for v in (row, column)]
+    offsets = range(1 - taps // 2, taps // 2 + 1)
+    weights = [[weight((v - w) - k) for k in offsets] for v, w in zip((row, column), whole)]
+    total, norm = np.zeros(row.shape), sum(weights[0]) * sum(weights[1])
+    for k, along in zip(offsets, weights[0]):
+        part = np.zeros(row.shape)
+        for l, across in zip(offsets, weights[1]):
+            part += across * _taken(block, whole[0] + k, whole[1] + l)[0]
+        total += along * part
+    return np.where(known, total / norm, np.nan)
+
+
+def _bilinear(block: np.ndarray, row: np.ndarray, column: np.ndarray) -> np.ndarray:
+    return _weighted(block, row, column, 2, lambda x: 1.0 - np.abs(x))
+
+
+def _sinc(block: np.ndarray, row: np.ndarray, column: np.ndarray) -> np.ndarray:
+    """Under a raised cosine that ends after _SINC samples."""
+    return _weighted(block, row, column, 2 * _SINC, lambda x: np.sinc(x) * (0.5 + 0.5 * np.cos(np.pi * x / _SINC)))
+
+
+def resample(raster: Any, line: np.ndarray, sample: np.ndarray, how: str) -> np.ndarray:
+    """The raster at places between its samples, float32; amplitudes of complex samples."""
+    window = _window(line, sample, raster.shape, _SINC)
+    if window is None:
+        return np.full(line.shape, np.nan, np.float32)
+    first_line, lines, first_sample, samples = window
+    block = raster[first_line : first_line + lines, first_sample : first_sample + samples]
+    block = np.abs(block) if np.iscomplexobj(block) else block.astype(np.float64)
+    made = {"nearest": _nearest, "bilinear": _bilinear, "sinc": _sinc}[how](
+        block, line - first_line, sample - first_sample
+    )
+    return made.astype(np.float32)
+
+
+# --- Terrain ------------------------------------------------------------------------------------------------------
+
+
+def earth_fixed(latitude: np.ndarray, longitude: np.ndarray, height: np.ndarray) -> np.ndarray:
+    """Earth-fixed places, shape of the latitudes and 3, m."""
+    phi, lam = np.radians(latitude), np.radians(longitude)
+    east = _A * _A / np.hypot(_A * np.cos(phi), _B * np.sin(phi))
+    out = (east + height) * np.cos(phi)
+    up = (east * (_B / _A) ** 2 + height) * np.sin(phi)
+    return np.stack([out * np.cos(lam), out * np.sin(lam), up], axis=-1)
+
+
+def terrain_normals(ground: np.ndarray) -> np.ndarray:
+    """Outward unit normals of a surface through a grid of places, by differences of neighbours."""
+    down, right = np.gradient(ground, axis=0), np.gradient(ground, axis=1)
+    normal = np.cross(right, down)
+    normal *= np.sign(np.sum(normal * ground, axis=-1, keepdims=True))
+    return normal / np.linalg.norm(normal, axis=-1, keepdims=True)
+
+
+def horizontal(sight: np.ndarray, latitude: np.ndarray, longitude: np.ndarray) -> tuple[np.ndarray, np.ndarray]:
+    """East and north part of directions, as a unit vector in the horizontal plane."""
+    phi, lam = np.radians(latitude), np.radians(longitude)
+    east = -np.sin(lam) * sight[..., 0] + np.cos(lam) * sight[..., 1]
+    inward = np.cos(lam) * sight[..., 0] + np.sin(lam) * sight[..., 1]
+    north = -np.sin(phi) * inward + np.cos(phi) * sight[..., 2]
+    length = np.hypot(east, north)
+    return east / length, north / length
+
+
+def map_steps(east: Any, north: Any, latitude: np.ndarray, longitude: np.ndarray, grid: MapGrid) -> Any:
+    """Rows and columns of the map that one pixel's length on the ground towards the platform leads over."""
+    ahead_latitude = latitude + np.degrees(grid.pixel_m * north / _A)
+    ahead_longitude = longitude + np.degrees(grid.pixel_m * east / (_A * np.cos(np.radians(latitude))))
+    there = _transformer("EPSG:4326", grid.crs)
+    x0, y0 = there.transform(longitude, latitude)
+    x1, y1 = there.transform(ahead_longitude, ahead_latitude)
+    return (y1 - y0) / grid.transform[4], (x1 - x0) / grid.transform[0]
+
+
+def layover_and_shadow(height: np.ndarray, incidence: np.ndarray, steps: Any, pixel_m: float, inner: Any) -> np.ndarray:
+    """1 where another place along the line of sight's plane has the same range, 2 where one hides this one.
+
+    The rays are taken as parallel over the few kilometres in question, and the ground as flat between places.
+    """
+    rows, columns = np.indices(height.shape)[:, inner[0], inner[1]]
+    here, angle = height[inner], incidence[inner]
+    row_step, column_step = (step[inner] for step in steps)
+    reach = max(inner[0].start, inner[1].start)
+    mask = np.zeros(here.shape, np.uint8)
+    for k in range(1, reach + 1):
+        distance = k * pixel_m
+        nearer = _bilinear(height, rows + k * row_step, columns + k * column_step) - here
+        farther = _bilinear(height, rows - k * row_step, columns - k * column_step) - here
+        with np.errstate(invalid="ignore"):
+            mask[nearer * np.tan(angle) > distance] |= 2
+            mask[(-nearer > distance * np.tan(angle)) | (farther > distance * np.tan(angle))] |= 1
+    return mask

@@ -1,0 +1,235 @@
+"""Terrain-corrected maps: images on the grid of an elevation model, or on one that is asked for."""
+
+from __future__ import annotations
+
+import os
+from typing import Any, NamedTuple, Optional, Sequence, Union
+
+import numpy as np
+
+from . import _maps
+from ._maps import MapGrid, Terrain
+from .product import Product
+
+__all__ = ["QUANTITIES", "geocode"]
+
+Path = Union[str, os.PathLike]
+
+QUANTITIES: dict[str, tuple[str, str]] = {
+    "image": ("", "image, amplitude of complex samples"),
+    "height": ("m", "height above the ellipsoid"),
+    "line": ("", "line of the image, from 0"),
+    "sample": ("", "sample of the image, from 0"),
+    "incidence": ("degrees", "angle between the line of sight and the ellipsoid's normal"),
+    "local_incidence": ("degrees", "angle between the line of sight and the terrain's normal"),
+    "mask": ("", "sum of 1 where layover and 2 where shadow lies"),
+}
+"""What can be had on the map: name, unit and meaning."""
+
+
+class _Job(NamedTuple):
+    """All that a tile of the map is made of: paths and numbers, so that it travels to other machines."""
+
+    header: str
+    terrain: Terrain
+    grid: MapGrid
+    resampling: str
+    quantities: tuple[str, ...]
+
+    def tile(self, row: int, column: int, rows: int, columns: int) -> dict[str, np.ndarray]:
+        """Those quantities on rows x columns of the map from a place on."""
+        product = Product(self.header)
+        return _Tile(self, product, row, column, rows, columns).quantities()
+
+
+class _Tile:
+    """Terrain and its sight by the radar on a part of the map."""
+
+    def __init__(self, job: _Job, product: Product, row: int, column: int, rows: int, columns: int) -> None:
+        self._job = job
+        self._product = product
+        self._inner = (slice(0, rows), slice(0, columns))
+        self._margin = 0
+        self._place = (row, column, rows, columns)
+        self._locate(self._reach(product) if self._needs_terrain() else 0)
+
+    def _needs_terrain(self) -> bool:
+        return bool({"mask", "local_incidence"} & set(self._job.quantities))
+
+    def _reach(self, product: Product) -> int:
+        """Pixels of the map over which the terrain around this part can hide it or fall on it; at least one."""
+        if "mask" not in self._job.quantities:
+            return 1
+        row, column, rows, columns = self._place
+        reach = 1
+        for _ in range(8):  # each round sees the relief that the one before has let in
+            heights = self._heights(row - reach, column - reach, rows + 2 * reach, columns + 2 * reach)[2]
+            relief = float(np.nanmax(heights) - np.nanmin(heights)) if np.isfinite(heights).any() else 0.0
+            wanted = 1 + int(np.ceil(relief * _STEEPEST / self._job.grid.pixel_m))
+            if wanted <= reach:
+                break
+            reach = wanted
+        return reach
+
+    def _heights(self, row: int, column: int, rows: int, columns: int) -> tuple[np.ndarray, np.ndarray, np.ndarray]:
+        longitude, latitude = self._job.grid.places(row, column, rows, columns)
+        return longitude, latitude, self._job.terrain.heights(longitude, latitude)
+
+    def _locate(self, margin: int) -> None:
+        row, column, rows, columns = self._place
+        self._margin = margin
+        self._inner = (slice(margin, margin + rows), slice(margin, margin + columns))
+        around = (row - margin, column - margin, rows + 2 * margin, columns + 2 * margin)
+        self.longitude, self.latitude, self.height = self._heights(*around)
+        self.seen = self._product.orbit.to_radar(self.latitude, self.longitude, self.height)
+        found = self._product.grid.pixels(self.seen.azimuth_time, self.seen.range_time)
+        self.line, self.sample = np.asarray(found.line), np.asarray(found.sample)
+
+    def quantities(self) -> dict[str, np.ndarray]:
+        """The quantities that are asked for, by name."""
+        return {name: getattr(self, "_" + name)() for name in self._job.quantities}
+
+    def _image(self) -> np.ndarray:
+        line, sample = self.line[self._inner], self.sample[self._inner]
+        return _maps.resample(self._product.raster, line, sample, self._job.resampling)
+
+    def _line(self) -> np.ndarray:
+        return self.line[self._inner]
+
+    def _sample(self) -> np.ndarray:
+        return self.sample[self._inner]
+
+    def _height(self) -> np.ndarray:
+        return self.height[self._inner]
+
+    def _incidence_of_all(self) -> np.ndarray:
+        seen = self.seen
+        made = self._product.orbit.quantities(["incidence"], seen.azimuth_time, seen.range_time, None, self.height)
+        return np.asarray(made["incidence"])
+
+    def _incidence(self) -> np.ndarray:
+        return self._incidence_of_all()[self._inner]
+
+    def _sight(self) -> tuple[np.ndarray, np.ndarray]:
+        """Unit vectors from the ground to the platform, and the ground, both (rows, columns, 3), Earth-fixed."""
+        ground = _maps.earth_fixed(self.latitude, self.longitude, self.height)
+        platform = self._product.orbit.position(np.where(np.isfinite(self.seen.azimuth_time), self.seen.azimuth_time, self._product.orbit.first_time))
+        line = platform - ground
+        return line / np.linalg.norm(line, axis=-1, keepdims=True), ground
+
+    def _local_incidence(self) -> np.ndarray:
+        sight, ground = self._sight()
+        cosine = np.sum(sight * _maps.terrain_normals(ground), axis=-1)
+        angle = np.degrees(np.arccos(np.clip(cosine, -1.0, 1.0)))
+        angle[~np.isfinite(self.seen.azimuth_time)] = np.nan
+        return angle[self._inner]
+
+    def _mask(self) -> np.ndarray:
+        sight, _ = self._sight()
+        east, north = _maps.horizontal(sight, self.latitude, self.longitude)
+        steps = _maps.map_steps(east, north, self.latitude, self.longitude, self._job.grid)
+        return _maps.layover_and_shadow(
+            self.height, np.radians(self._incidence_of_all()), steps, self._job.grid.pixel_m, self._inner
+        )
+
+
+# Terrain hides or overlays what lies so many times its height away at most: the cotangent of the steepest look, and
+# the tangent of the flattest, of imaging radars in orbit (20 to 60 degrees of incidence).
+_STEEPEST = 2.75
+
+
+def geocode(
+    product: Union[Product, Path],
+    dem: Path,
+    crs: Any = None,
+    spacing: Optional[float] = None,
+    resampling: str = "bilinear",
+    quantities: Sequence[str] = ("image",),
+    *,
+    heights: Optional[str] = None,
+    chunks: Optional[int] = None,
+) -> Any:
+    """The product's image as a map: an xarray.Dataset with one variable for each quantity.
+
+    dem: elevation model, any file that rasterio reads. heights: what its heights stand on, "ellipsoid" (WGS84),
+    "egm96" or "egm2008"; unless told, what the file names, and one that names nothing is refused. Geoid heights are
+    converted by pyproj, or refused where its grids are missing. crs and
+    spacing (in units of crs): the map's reference system and pixels; unless given those of the elevation model.
+    The map covers the model as far as the image may reach. resampling: "nearest", "bilinear" or "sinc" (eight
+    samples each way). quantities: see QUANTITIES. chunks: pixels of a tile's side; then the variables are dask
+    arrays of tiles that are made when they are asked for, on any scheduler. Not-a-number where there is no image.
+
+    Amplitudes of complex images are interpolated, not the samples: their phase turns too fast for a neighbour's.
+    """
+    _check(resampling, quantities)
+    held = product if isinstance(product, Product) else Product(product)
+    if held.path is None:
+        raise ValueError("a product in memory has no raster to map")
+    terrain = Terrain.of(dem, heights)
+    job = _Job(held.path, terrain, MapGrid.over(held, terrain, crs, spacing), resampling, tuple(quantities))
+    return _dataset(job, _eager(job) if chunks is None else _lazy(job, chunks))
+
+
+def _check(resampling: str, quantities: Sequence[str]) -> None:
+    if resampling not in _maps.RESAMPLINGS:
+        raise ValueError(f"resampling is one of {', '.join(_maps.RESAMPLINGS)}, not {resampling!r}")
+    unknown = [name for name in quantities if name not in QUANTITIES]
+    if unknown or not quantities:
+        raise ValueError(f"quantities are {', '.join(QUANTITIES)}, not {', '.join(unknown) or 'none'}")
+
+
+_TILE = 512
+
+
+def _spans(length: int, size: int) -> list[tuple[int, int]]:
+    return [(first, min(size, length - first)) for first in range(0, length, size)]
+
+
+def _eager(job: _Job) -> dict[str, np.ndarray]:
+    shape = job.grid.shape
+    made = {name: np.empty(shape, _dtype(name)) for name in job.quantities}
+    for row, rows in _spans(shape[0], _TILE):
+        for column, columns in _spans(shape[1], _TILE):
+            for name, values in job.tile(row, column, rows, columns).items():
+                made[name][row : row + rows, column : column + columns] = values
+    return made
+
+
+def _dtype(name: str) -> np.dtype:
+    return np.dtype({"mask": "u1", "image": "f4"}.get(name, "f8"))
+
+
+def _lazy(job: _Job, size: int) -> dict[str, Any]:
+    """A graph in which each tile is made once, whatever is asked of it."""
+    import operator
+
+    import dask.array as da
+    from dask.base import tokenize
+    from dask.highlevelgraph import HighLevelGraph
+
+    rows, columns = (_spans(length, size) for length in job.grid.shape)
+    token = tokenize(job, size)
+    places = [(i, j) for i in range(len(rows)) for j in range(len(columns))]
+    tiles = {
+        (f"tile-{token}", i, j): (job.tile, rows[i][0], columns[j][0], rows[i][1], columns[j][1]) for i, j in places
+    }
+    chunks = tuple(tuple(count for _, count in spans) for spans in (rows, columns))
+    made = {}
+    for name in job.quantities:
+        key = f"{name}-{token}"
+        layer = {(key, i, j): (operator.getitem, (f"tile-{token}", i, j), name) for i, j in places}
+        layers = {f"tile-{token}": tiles, key: layer}
+        graph = HighLevelGraph(layers, {f"tile-{token}": set(), key: {f"tile-{token}"}})
+        made[name] = da.Array(graph, key, chunks, dtype=_dtype(name))
+    return made
+
+
+def _dataset(job: _Job, made: dict[str, Any]) -> Any:
+    from xarray import Dataset, Variable
+
+    variables = {
+        name: Variable(("y", "x"), values, {"units": QUANTITIES[name][0], "long_name": QUANTITIES[name][1]})
+        for name, values in made.items()
+    }
+    x, y = job.grid.axes()
+    return Dataset(variables, {"x": x, "y": y}, {"crs": job.grid.crs, "transform": job.grid.transform})

@@ -1,0 +1,49 @@
+"""Times: seconds since 1 January 1985 without leap seconds, as the library counts them, and numpy's datetime64."""
+
+from __future__ import annotations
+
+from typing import Any
+
+import numpy as np
+
+from . import _core
+
+__all__ = ["to_datetime64", "to_seconds", "to_text"]
+
+_EPOCH = np.datetime64("1985-01-01T00:00:00", "ns")
+_SECOND = np.timedelta64(1, "s")
+_NANOSECOND = np.timedelta64(1, "ns")
+
+
+def to_seconds(times: Any) -> Any:
+    """Seconds since 1985 of numbers (as they are), datetime64, datetime or texts, in the shape of the input.
+
+    Texts are ISO 8601 ("2022-01-04T17:05:58.25") or the headers' form ("04-JAN-2022 17:05:58.250000"). Not-a-time
+    becomes not-a-number. Of a time in this century a float64 keeps quarters of a microsecond.
+    """
+    array = np.asarray(times)
+    if array.dtype.kind == "U":
+        return np.vectorize(_core.seconds_of_text, otypes=[np.float64])(array)[()]
+    if array.dtype.kind == "O":
+        array = array.astype("datetime64[us]")
+    if array.dtype.kind != "M":
+        return times
+    known = ~np.isnat(array)
+    since = np.where(known, array.astype("datetime64[ns]"), _EPOCH) - _EPOCH
+    whole = since // _SECOND
+    return np.where(known, whole + (since - whole * _SECOND) / _SECOND, np.nan)[()]
+
+
+def to_datetime64(seconds: Any) -> Any:
+    """datetime64[ns] of seconds since 1985; not-a-number and infinities become not-a-time."""
+    values = np.asarray(seconds, dtype=np.float64)
+    known = np.isfinite(values)
+    whole = np.floor(np.where(known, values, 0.0))
+    rest = np.rint((np.where(known, values, 0.0) - whole) * 1e9)
+    times = _EPOCH + whole.astype(np.int64) * _SECOND + rest.astype(np.int64) * _NANOSECOND
+    return np.where(known, times, np.datetime64("NaT", "ns"))[()]
+
+
+def to_text(seconds: float, iso: bool = True) -> str:
+    """A time as text: ISO 8601 to microseconds, rounded, or the headers' form, cut to microseconds."""
+    return _core.text_of_seconds(seconds, iso)

@@ -1,0 +1,71 @@
+import os
+import shutil
+import struct
+
+import numpy as np
+import pytest
+from conftest import DATA, SCENES, tie_points
+from quo_base import FileError, sentinel1
+
+NAME = "S1A_IW_SLC__1SDV_20220104T170557_20220104T170624_041314_04E951_F1F1.SAFE"
+LINES, SAMPLES = 4503, 22694
+
+
+def write_sparse_tiff(path):
+    """Complex 16-bit samples in one strip, all zero and none of them on the disk."""
+    size = LINES * SAMPLES * 4
+    tags = [
+        (256, SAMPLES),
+        (257, LINES),
+        (258, 32),
+        (259, 1),
+        (262, 1),
+        (273, 8),
+        (277, 1),
+        (278, LINES),
+        (279, size),
+    ]
+    tags.append((339, 5))
+    with open(path, "wb") as file:
+        file.write(struct.pack("<2sHI", b"II", 42, 8 + size))
+        file.seek(8 + size)
+        file.write(
+            struct.pack("<H", len(tags)) + b"".join(struct.pack("<HHII", tag, 4, 1, value) for tag, value in tags)
+        )
+        file.write(struct.pack("<I", 0))
+
+
+@pytest.fixture
+def safe(tmp_path):
+    folder = tmp_path / NAME
+    shutil.copytree(DATA / "sentinel1" / NAME, folder)
+    annotation = next((folder / "annotation").iterdir())
+    (folder / "measurement").mkdir(exist_ok=True)
+    write_sparse_tiff(folder / "measurement" / (annotation.stem + ".tiff"))
+    return folder
+
+
+def test_an_imported_product_meets_its_tie_points(safe, tmp_path):
+    product, linked, ties = sentinel1.import_product(safe, tmp_path / "image.slc", link=True)
+    assert linked and product.raster.shape == (LINES, SAMPLES) and product.grid.bursts == 3
+    assert ties.most_line < 0.05 and ties.most_sample < 0.05 and ties.most_ground_m < 1.0
+    azimuth, slant, *place = tie_points(SCENES[0])
+    seen = product.orbit.to_radar(*place)
+    inside = azimuth < product.orbit.first_time + 65
+    np.testing.assert_allclose(seen.azimuth_time[inside], azimuth[inside], rtol=0, atol=2.5e-6)
+    pixels = product.grid.pixels(seen.azimuth_time, seen.range_time)
+    known = pixels.status == 0
+    back = product.grid.times(pixels.line[known], pixels.sample[known])
+    np.testing.assert_allclose(back.range_time, slant[known], rtol=0, atol=1e-12)
+    assert not product.raster[4000, ::1000].any()
+
+
+def test_what_the_progress_raises_ends_the_import(safe, tmp_path):
+    def stop(done, everything):
+        raise KeyboardInterrupt
+
+    with pytest.raises(KeyboardInterrupt):
+        sentinel1.import_product(safe, tmp_path / "image.slc", progress=stop)
+    with pytest.raises(FileError) as caught:
+        sentinel1.import_product(tmp_path / "absent", tmp_path / "image.slc")
+    assert "absent" in str(caught.value) and os.listdir(tmp_path) == [NAME]
