@@ -3,5 +3,6 @@
 set -eu
 cd "$(dirname "$0")"
 scripts/install_deps.sh
-scripts/build.sh release quo_base quo example_complete_product echo_simulator processor point_targets
+scripts/build.sh release quo_base quo_base_tiff quo example_complete_product make_measurement echo_simulator processor \
+    point_targets
 exec scripts/demo_job.sh build/release

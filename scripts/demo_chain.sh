@@ -16,15 +16,17 @@ echo "Nine reflectors, seen from the orbit of the first scene:"
 "$chain/processor" "$folder/raw" "$folder/image" --configuration examples/processor/focus.xml --verbose
 echo
 echo "Where they are in the focused image, and what they look like (theory: sidelobes -13.3 dB, integrated -10.2 dB):"
-"$chain/point_targets" "$folder/image" "$targets"
+"$chain/point_targets" "$folder/image" "$targets" --picture "$folder/target.png" --target Elio
 echo
 "$quo" info "$folder/image.hdr"
-"$quo" quicklook "$folder/raw" "$folder/raw.png"
-"$quo" quicklook "$folder/image" "$folder/image.png" --db -30:30
+"$quo" quicklook "$folder/raw" "$folder/raw.png" --width 500 --frame --title "Echoes"
+"$quo" quicklook "$folder/image" "$folder/image.png" --width 500 --frame --title "Focused"
+"$quo" spectrum "$folder/image" "$folder/spectrum.png" --header "$folder/image.hdr" >/dev/null
 "$quo" footprint "$folder/image.hdr" >"$folder/footprint.geojson"
 if grep -l ERROR "$folder"/*.report.txt; then
     echo "demo_chain.sh: a report has errors" >&2
     exit 1
 fi
 echo
-echo "Pictures: $folder/raw.png before and $folder/image.png after focusing; outline: $folder/footprint.geojson"
+echo "In $folder: raw.png before and image.png after focusing, target.png, one of the reflectors, spectrum.png and"
+echo "footprint.geojson"

@@ -15,4 +15,5 @@ printf 'azimuth_time_s,range_time_s\n1133090050.25,0.0058123\n' |
     "$quo" geolocate "$scenes/s1a_iw_grd_20201127_desc_sea.xml" --to ground
 
 scripts/demo_product.sh "$1"
+scripts/demo_import.sh "$1"
 scripts/demo_chain.sh "$1"

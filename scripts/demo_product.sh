@@ -32,7 +32,7 @@ awk -v first="$(roi SlowStartTime)" -v duration="$(roi SlowTimeLength)" \
         printf "last far,%.17g,%.17g\n", first + duration, near + depth
     }' | "$quo" geolocate "$header" --to ground | cut -d , -f 1,7-9
 
-"$quo" quicklook "$raster" "$folder/quicklook.png"
+"$quo" quicklook "$raster" "$folder/quicklook.png" --north-up --frame
 "$quo" footprint "$header" >"$folder/footprint.geojson"
 "$quo" vrt "$raster"
 echo

@@ -1,23 +1,50 @@
 // Measures point targets in a focused image: position, resolution, sidelobes, phase.
 #include <algorithm>
 #include <cstdio>
+#include <fstream>
 #include <string>
 
 #include "../common/command_line.h"
 #include "../common/session.h"
 #include "measure.h"
+#include "portrait.h"
+
+namespace {
+
+struct Options {
+    std::string image, targets, picture, portrayed;
+};
+
+void measure(const Options& options) {
+    const auto targets = example::read_targets(options.targets);
+    const std::string name = options.portrayed.empty() && !targets.empty() ? targets[0].name : options.portrayed;
+    example::Closeup closeup;
+    const auto found = example::measure(options.image, targets, name, &closeup);
+    example::print_table(stdout, found);
+    if (!options.picture.empty()) {
+        const auto shown = std::ranges::find(found, name, &example::Measurement::name);
+        if (shown == found.end()) throw example::Failure{"no target " + name};
+        const std::string bytes = png_of(example::portrait(*shown, closeup));
+        if (!(std::ofstream{options.picture, std::ios::binary} << bytes << std::flush))
+            throw example::Failure{options.picture + ": cannot be written"};
+    }
+    if (!std::all_of(found.begin(), found.end(), example::within_bounds))
+        throw example::Failure{"a target is further off than 0.1 samples, 5 % in resolution or 0.1 rad"};
+}
+
+}  // namespace
 
 int main(int argc, char** argv) {
     command_line::Program app{"Measures point targets in a focused image"};
-    std::string image, targets;
-    app.needs("image", image, "Focused image; its product header is IMAGE.hdr");
-    app.needs("targets", targets, "Table of targets: name,latitude_deg,longitude_deg,height_m,strength");
+    Options options;
+    app.needs("image", options.image, "Focused image; its product header is IMAGE.hdr");
+    app.needs("targets", options.targets, "Table of targets: name,latitude_deg,longitude_deg,height_m,strength");
+    app.takes("--picture", options.picture,
+              "Draw the response to a target: from above, both cuts, and figures (PNG)");
+    app.takes("--target", options.portrayed, "Which target that is (the first)");
     if (const auto status = app.parse(argc, argv)) return *status;
-    const example::Files files{{image, image + ".hdr", targets}, {}};
-    return example::run_program("Point targets", files, image + ".targets.report.txt", "", 1, [&] {
-        const auto found = example::measure(image, example::read_targets(targets));
-        example::print_table(stdout, found);
-        if (!std::all_of(found.begin(), found.end(), example::within_bounds))
-            throw example::Failure{"a target is further off than 0.1 samples, 5 % in resolution or 0.1 rad"};
-    });
+    example::Files files{{options.image, options.image + ".hdr", options.targets}, {}};
+    if (!options.picture.empty()) files.written.push_back(options.picture);
+    return example::run_program("Point targets", files, options.image + ".targets.report.txt", "", 1,
+                                [&] { measure(options); });
 }

@@ -13,8 +13,8 @@ namespace example {
 namespace {
 
 constexpr double kPi = std::numbers::pi;
-constexpr int kChip = 64;   // lines and samples that are looked at
-constexpr int kFiner = 16;  // places between two of them
+constexpr int kChip = 64;  // lines and samples that are looked at
+constexpr int kFiner = Closeup::finer;
 constexpr int kFine = kChip * kFiner;
 
 /** An image around a target, finely interpolated: kFine rows of azimuth by kFine columns of range. */
@@ -61,6 +61,7 @@ Chip::Chip(BufferFile& image, int line, int sample, double doppler_cycles) {
 /** The brightest place; not at the border, where the image's other end shines in. */
 Chip::Place Chip::brightest() const {
     constexpr int kBorder = kFine / 8;
+    static_assert(kBorder >= Closeup::reach * Closeup::finer);
     Place place{kBorder, kBorder};
     for (int row = kBorder; row < kFine - kBorder; ++row)
         for (int column = kBorder; column < kFine - kBorder; ++column)
@@ -125,7 +126,19 @@ void open_image(const std::string& image, GeneralSAR& product) {
     if (!product.bufferFile.is_open()) throw Failure{image + ": cannot be read"};
 }
 
-Measurement find(GeneralSAR& product, const Target& target) {
+Closeup close_up(const Chip& chip, int row, int column) {
+    constexpr int kReach = Closeup::reach * Closeup::finer;
+    constexpr double kLeast = 1e-12;  // against the peak
+    const double top = chip.power(row, column);
+    Closeup closeup;
+    closeup.decibel.reserve(Closeup::side() * Closeup::side());
+    for (int i = -kReach; i <= kReach; ++i)
+        for (int j = -kReach; j <= kReach; ++j)
+            closeup.decibel.push_back(10.0 * std::log10(std::max(kLeast, chip.power(row + i, column + j) / top)));
+    return closeup;
+}
+
+Measurement find(GeneralSAR& product, const Target& target, Closeup* closeup) {
     const ROI_Obj& roi = product.roi.Roi;
     const SamplingConstants_Obj& sampling = product.samplingConstants;
     double place[3], located[3];
@@ -140,6 +153,7 @@ Measurement find(GeneralSAR& product, const Target& target) {
     const Chip chip{product.bufferFile, middle_line, middle_sample, doppler_hz * roi.SlowTimeDelta};
 
     const auto [row, column] = chip.brightest();
+    if (closeup != nullptr) *closeup = close_up(chip, row, column);
     const auto amplitude = [&](int r, int c) { return std::sqrt(chip.power(r, c)); };
     const double top = amplitude(row, column);
     const double rows = row + parabola_peak(amplitude(row - 1, column), top, amplitude(row + 1, column));
@@ -174,12 +188,14 @@ Measurement find(GeneralSAR& product, const Target& target) {
 
 }  // namespace
 
-std::vector<Measurement> measure(const std::string& image, const std::vector<Target>& targets) {
+std::vector<Measurement> measure(const std::string& image, const std::vector<Target>& targets,
+                                 const std::string& portrayed, Closeup* closeup) {
     GeneralSAR product;
     open_image(image, product);
     std::vector<Measurement> found;
     found.reserve(targets.size());
-    for (const Target& target : targets) found.push_back(find(product, target));
+    for (const Target& target : targets)
+        found.push_back(find(product, target, target.name == portrayed ? closeup : nullptr));
     return found;
 }
 

@@ -27,11 +27,25 @@ struct Measurement {
     double strength_db;  // amplitude at the peak, against the given strength
 };
 
+/** What lies around the peak of a response, finely interpolated. */
+struct Closeup {
+    static constexpr int reach = 8;   // samples and lines to each side
+    static constexpr int finer = 16;  // places from one to the next
+    std::vector<double> decibel;      // rows of azimuth, against the peak in the middle
+
+    [[nodiscard]] static constexpr std::size_t side() { return 2 * reach * finer + 1; }
+    [[nodiscard]] double at(std::size_t row, std::size_t column) const {
+        return decibel.at(row * side() + column);
+    }
+};
+
 /** Finds the targets in an image whose product header is "<image>.hdr" and measures their responses.
  *
  * A target is expected where the orbit passes it at zero Doppler, within some lines and samples. The image is
- * interpolated there by zero-padding its spectrum, after its Doppler centroid was taken off. Throws Failure. */
-std::vector<Measurement> measure(const std::string& image, const std::vector<Target>& targets);
+ * interpolated there by zero-padding its spectrum, after its Doppler centroid was taken off. Throws Failure.
+ * The closeup is that of the target `portrayed`, empty without one of that name. */
+std::vector<Measurement> measure(const std::string& image, const std::vector<Target>& targets,
+                                 const std::string& portrayed = "", Closeup* closeup = nullptr);
 
 /** Prints the measurements as a table. */
 void print_table(std::FILE* out, const std::vector<Measurement>& measurements);

@@ -6,6 +6,7 @@
 #include <numbers>
 #include <random>
 
+#include "picture_reader.h"
 #include "quo_base/fft.h"
 #include "raster_folder.h"
 
@@ -63,7 +64,25 @@ TEST_F(SignalVerbs, SpectrumMeasuresTheBandsThatAreThere) {
     EXPECT_NEAR(cycles["range_bandwidth"], 0.72, 0.02);
     EXPECT_NEAR(cycles["doppler_centroid"], -0.31, 0.005);
     EXPECT_NEAR(cycles["azimuth_bandwidth"], 0.55, 0.01);
-    EXPECT_EQ(test::read_text(plot).substr(1, 3), "PNG");
+    // Red lines mark what lies within 3 dB; 896 columns from 74 on are the band, the second panel begins at row
+    // 422.
+    const test::SeenPicture picture{plot};
+    const auto red_columns = [&](int first_row) {
+        std::vector<int> columns;
+        for (int x = 0; x < picture.width; ++x)
+            for (int y = first_row; y < first_row + 300; ++y)
+                if (picture.at(x, y) > 180 && picture.at(x, y, 1) < 60 && picture.at(x, y, 2) < 40) {
+                    columns.push_back(x);
+                    break;
+                }
+        return columns;
+    };
+    const std::vector<int> range = red_columns(98), azimuth = red_columns(458);
+    EXPECT_NEAR(range.front(), 74 + (0.5 - 0.36) * 896, 8);
+    EXPECT_NEAR(range.back(), 74 + (0.5 + 0.36) * 896, 8);
+    EXPECT_NEAR(static_cast<double>(range.size()), 0.72 * 896, 16);
+    EXPECT_LE(azimuth.front(), 76);  // from -0.585 to -0.035 around the end of the band
+    EXPECT_GE(azimuth.back(), 966);
 
     const auto hertz = measured({"--header", test::scene_file("s1a_iw1_slc_20220104_asc.xml")});
     EXPECT_EQ(hertz["unit"], "Hz");

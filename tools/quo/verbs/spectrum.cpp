@@ -11,10 +11,11 @@
 #include "apart.h"
 #include "commands.h"
 #include "interrupt.h"
-#include "plot.h"
+#include "output.h"
 #include "progress.h"
 #include "quo_base/acquisition.h"
 #include "raster.h"
+#include "spectrum_picture.h"
 #include "transform.h"
 
 namespace tool {
@@ -173,8 +174,9 @@ Band band_of(const Power& power) {
 
 /** Sampling rates of both directions; 1 and cycles per sample where no header tells them. */
 struct Rates {
-    const char* unit = "cycles/sample";
+    bool in_hertz = false;
     double range = 1.0, azimuth = 1.0;
+    [[nodiscard]] const char* unit() const { return in_hertz ? "Hz" : "cycles/sample"; }
 };
 
 Rates rates_of(const std::string& header) {
@@ -183,19 +185,23 @@ Rates rates_of(const std::string& header) {
     if (constants.readhdr(header.c_str()) != QUO_OK) throw Failure(header + ": no sampling constants");
     if (!(constants.frg_hz > 0.0) || !(constants.prf_hz > 0.0))
         throw Failure(header + ": range sampling rate or pulse repetition frequency is unknown");
-    return {"Hz", constants.frg_hz, constants.prf_hz};
+    return {true, constants.frg_hz, constants.prf_hz};
 }
 
-Curve curve_of(const char* direction, const Power& power, double centre, double rate, const char* unit) {
-    const double scale = rate >= 1e6 ? 1e-6 : rate >= 1e3 ? 1e-3 : 1.0;
-    const char* prefix = rate >= 1e6 ? "M" : rate >= 1e3 ? "k" : "";
-    Curve curve{std::string{direction} + " dB / " + prefix + unit, smoothed(power), -0.5 * rate * scale,
-                0.5 * rate * scale, centre * rate * scale};
-    const double peak = *std::ranges::max_element(curve.decibel);
-    for (double& value : curve.decibel) value = 10.0 * std::log10(value / peak);  // nothing is far below
-    const auto count = static_cast<std::ptrdiff_t>(power.size());
-    std::rotate(curve.decibel.begin(), curve.decibel.end() - count / 2, curve.decibel.end());
-    return curve;
+SpectrumShown shown_of(const char* direction, const char* centre_name, const Power& power, const Band& band,
+                       double rate, const Rates& rates) {
+    SpectrumShown spectrum{std::string{direction} + " spectrum",
+                           power,
+                           smoothed(power),
+                           rate,
+                           rates.in_hertz,
+                           centre_name,
+                           band.centre,
+                           band.width};
+    const double peak = *std::ranges::max_element(spectrum.smoothed);
+    for (std::vector<double>* const values : {&spectrum.decibel, &spectrum.smoothed})
+        for (double& value : *values) value = 10.0 * std::log10(value / peak);  // nothing is far below
+    return spectrum;
 }
 
 int spectrum(const SpectrumOptions& options) {
@@ -210,25 +216,29 @@ int spectrum(const SpectrumOptions& options) {
     spectra.run(options.raster, raster, options.threads, options.waitbar);
     if (!(*std::ranges::max_element(spectra.range()) > 0.0)) throw Failure(options.raster + ": holds no signal");
     const Band range = band_of(spectra.range()), azimuth = band_of(spectra.azimuth());
-    write_png(plot({curve_of("range", spectra.range(), range.centre, rates.range, rates.unit),
-                    curve_of("azimuth", spectra.azimuth(), azimuth.centre, rates.azimuth, rates.unit)}),
-              options.picture);
-
     const std::pair<const char*, double> values[] = {{"range_centre", range.centre * rates.range},
                                                      {"range_bandwidth", range.width * rates.range},
                                                      {"doppler_centroid", azimuth.centre * rates.azimuth},
                                                      {"azimuth_bandwidth", azimuth.width * rates.azimuth}};
+    const std::string segments = "mean of " + std::to_string(spectra.segments()) + " segments of " +
+                                 std::to_string(spectra.lines()) + " lines x " +
+                                 std::to_string(spectra.samples()) + " samples";
+    write_output(
+        options.picture,
+        png_of(draw_spectra(
+            shown(options.raster), segments + "; pale: bin by bin, dark: smoothed over 1/64 of the band",
+            {shown_of("Range", "centre", spectra.range(), range, rates.range, rates),
+             shown_of("Azimuth", "Doppler centroid", spectra.azimuth(), azimuth, rates.azimuth, rates)})));
+
     nlohmann::ordered_json json{{"raster", options.raster},
                                 {"segments", spectra.segments()},
                                 {"segment_lines", spectra.lines()},
                                 {"segment_samples", spectra.samples()},
-                                {"unit", rates.unit}};
-    std::string text = "# mean of " + std::to_string(spectra.segments()) + " segments of " +
-                       std::to_string(spectra.lines()) + " lines x " + std::to_string(spectra.samples()) +
-                       " samples\nquantity,value,unit\n";
+                                {"unit", rates.unit()}};
+    std::string text = "# " + segments + "\nquantity,value,unit\n";
     for (const auto& [name, value] : values) {
         json[name] = value;
-        text += std::string{name} + "," + exact(value) + "," + rates.unit + "\n";
+        text += std::string{name} + "," + exact(value) + "," + rates.unit() + "\n";
     }
     options.json ? print_json(json) : print(text);
     return kFine;

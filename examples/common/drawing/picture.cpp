@@ -3,11 +3,9 @@
 #include <png.h>
 
 #include <csetjmp>
+#include <new>
 
-#include "failure.h"
-#include "output.h"
-
-namespace tool {
+namespace drawing {
 namespace {
 
 /** What libpng's writing calls share. */
@@ -18,7 +16,7 @@ public:
           info_{png_ ? png_create_info_struct(png_) : nullptr} {
         if (!info_) {
             png_destroy_write_struct(&png_, nullptr);
-            throw Failure("no memory for a picture");
+            throw std::bad_alloc{};
         }
         png_set_write_fn(png_, this, append, nullptr);
     }
@@ -30,11 +28,12 @@ public:
     bool encode(const Picture& picture) {
         if (setjmp(png_jmpbuf(png_))) return false;  // NOLINT(cert-err52-cpp): libpng's way of failing
         png_set_IHDR(png_, info_, static_cast<png_uint_32>(picture.width),
-                     static_cast<png_uint_32>(picture.height), 8, PNG_COLOR_TYPE_GRAY, PNG_INTERLACE_NONE,
+                     static_cast<png_uint_32>(picture.height), 8,
+                     picture.channels == 1 ? PNG_COLOR_TYPE_GRAY : PNG_COLOR_TYPE_RGB, PNG_INTERLACE_NONE,
                      PNG_COMPRESSION_TYPE_DEFAULT, PNG_FILTER_TYPE_DEFAULT);
         png_write_info(png_, info_);
         for (std::size_t row = 0; row < picture.height; ++row) {
-            png_write_row(png_, picture.grey.data() + row * picture.width);
+            png_write_row(png_, picture.values.data() + row * picture.width * picture.channels);
         }
         png_write_end(png_, info_);
         return true;
@@ -53,10 +52,10 @@ private:
 
 }  // namespace
 
-void write_png(const Picture& picture, const std::string& name) {
+std::string png_of(const Picture& picture) {
     PngWriter writer;
-    if (!writer.encode(picture)) throw Failure(name + ": the picture cannot be encoded");
-    write_output(name, writer.bytes());
+    if (!writer.encode(picture)) throw std::bad_alloc{};  // all else that libpng refuses cannot occur
+    return writer.bytes();
 }
 
-}  // namespace tool
+}  // namespace drawing
