@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <cstdlib>
 #include <limits>
+#include <memory>
 #include <optional>
 
 #include "diagnosticslib/errno_kept.h"
@@ -102,13 +103,14 @@ public:
     static std::optional<LivePlan> find(const FftPlan* plan, FftDomain domain) noexcept {
         if (!plan || plan->n < 1 || plan->m < 1) return std::nullopt;
         LivePlan live{*plan, domain};
-        if (!live.matches(live.rows_, plan->rows, plan->nfft, plan->mfft, 1, plan->n)) return std::nullopt;
-        if (!live.matches(live.columns_, plan->columns, plan->mfft, plan->nfft, plan->n, 1)) return std::nullopt;
+        if (!live.matches(live.rows_.get(), plan->rows, plan->nfft, plan->mfft, 1, plan->n)) return std::nullopt;
+        if (!live.matches(live.columns_.get(), plan->columns, plan->mfft, plan->nfft, plan->n, 1))
+            return std::nullopt;
         return live;
     }
 
     [[nodiscard]] bool fits(const float* in, const float* out) const {
-        const FftTransform* first = rows_ ? rows_ : columns_;
+        const FftTransform* first = rows_ ? rows_.get() : columns_.get();
         if (!in || !out) return false;
         if (!first) return true;
         return first->geometry().in_place ? in == out : apart(in, out);
@@ -124,8 +126,8 @@ private:
     LivePlan(const FftPlan& plan, FftDomain domain)
         : plan_{plan},
           domain_{domain},
-          rows_{plan.rows ? quo::plan_store().find(plan.rows) : nullptr},
-          columns_{plan.columns ? quo::plan_store().find(plan.columns) : nullptr} {}
+          rows_{quo::plan_store().find(plan.rows)},
+          columns_{quo::plan_store().find(plan.columns)} {}
 
     [[nodiscard]] bool matches(const FftTransform* transform, const FftEnginePlan* handle, int length, int count,
                                std::ptrdiff_t stride, std::ptrdiff_t distance) const {
@@ -150,7 +152,7 @@ private:
 
     FftPlan plan_;
     FftDomain domain_;
-    FftTransform *rows_, *columns_;
+    std::shared_ptr<FftTransform> rows_, columns_;
 };
 
 int run_plan(const FftPlan* plan, FftDomain domain, const float* in, float* out) {

@@ -44,10 +44,6 @@ void mirror_first_row(const Padding& padding, int rows, fcomplex* row) {
     row[padding.nyquist()] = row[padding.mirror()] = value;
 }
 
-quo::FftTransform* transform_of(const FftEnginePlan* handle) {
-    return handle ? quo::plan_store().find(handle) : nullptr;
-}
-
 const float* floats(const fcomplex* samples) { return reinterpret_cast<const float*>(samples); }
 float* floats(fcomplex* samples) { return reinterpret_cast<float*>(samples); }
 
@@ -140,7 +136,7 @@ int interp::interpft_p(fcomplex* in, fcomplex* out) {
 // A few rows at a time, from the samples to the result while they are in the cache.
 int interp::resample_rows(fcomplex* in, fcomplex* out) const {
     const Padding padding{nx_in_, nx_out_};
-    quo::FftTransform *const forward = transform_of(forward_.rows), *const inverse = transform_of(inverse_.rows);
+    const auto forward = quo::plan_store().find(forward_.rows), inverse = quo::plan_store().find(inverse_.rows);
     if (!inverse || (nx_in_ > 1 && !forward)) return QUO_REFUSED;
     const int step = std::lcm(inverse->block(), forward ? forward->block() : 1);
     for (int first = 0; first < ny_in_; first += step) {
@@ -157,7 +153,7 @@ int interp::resample_rows(fcomplex* in, fcomplex* out) const {
 int interp::resample_columns(fcomplex* in, fcomplex* out) const {
     const Padding padding{ny_in_, ny_out_};
     const std::ptrdiff_t row = nx_in_;
-    quo::FftTransform* const inverse = transform_of(inverse_.columns);
+    const auto inverse = quo::plan_store().find(inverse_.columns);
     if (!inverse) return QUO_REFUSED;
     if (const int status = pfft_c(&forward_, in, in)) return status;
     std::copy_n(in, padding.upper() * row, out);

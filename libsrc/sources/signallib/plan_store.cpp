@@ -9,8 +9,6 @@ FftEnginePlan* PlanStore::open(FftEngine& engine, const FftGeometry& geometry) {
     return transform ? held_.hold(std::move(transform)) : nullptr;
 }
 
-FftTransform* PlanStore::find(const FftEnginePlan* handle) const noexcept { return held_.find(handle).get(); }
-
 std::size_t PlanStore::kept() const noexcept {
     const std::lock_guard guard{guard_};
     return kept_.size();

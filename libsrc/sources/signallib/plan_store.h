@@ -21,8 +21,11 @@ public:
 
     /** Null when the transform cannot be had. Throws std::bad_alloc. */
     [[nodiscard]] FftEnginePlan* open(FftEngine& engine, const FftGeometry& geometry);
-    /** Null for a handle that is not held. */
-    [[nodiscard]] FftTransform* find(const FftEnginePlan* handle) const noexcept;
+    /** Null for a handle that is not held, and for none. Whoever runs a plan holds it: another thread may release
+     * it meanwhile. */
+    [[nodiscard]] std::shared_ptr<FftTransform> find(const FftEnginePlan* handle) const noexcept {
+        return handle ? held_.find(handle) : nullptr;
+    }
     /** False for a handle that is not held. */
     bool close(const FftEnginePlan* handle) noexcept { return held_.release(handle) != nullptr; }
 
