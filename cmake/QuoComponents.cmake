@@ -9,9 +9,11 @@ target_compile_options(quo_flags INTERFACE
     # Results must not hang on which operations the compiler chose to fuse.
     -ffp-contract=off)
 target_compile_definitions(quo_flags INTERFACE _FILE_OFFSET_BITS=64)
-# Optimising what is written for the tests takes longer than running it as it is.
-set(quo_quick_build -O0)
+# Optimising what is written for the tests by more than this takes longer than running it, and under the sanitizers all
+# of it does.
+set(quo_quick_build -O1)
 if(QUO_SANITIZE)
+    set(quo_quick_build -O0)
     if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
         # The address of every access is checked by a call: written out in place, the same check takes longer to compile.
         list(APPEND quo_quick_build --param=asan-instrumentation-with-call-threshold=0)

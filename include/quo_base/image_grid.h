@@ -87,7 +87,8 @@ public:
      * dropped. 0; 1 for a region without a step. */
     int setRegion(const ROI_Obj& region);
     /** Gives a region the axes of a raster of this grid: from its first line, without the delay, and its first
-     * sample to its last ones. Bursts overlap, so that their lines are more than the region's. In ground range the
+     * sample to its last ones. Bursts overlap, so that their lines are more than the region's,
+     * which reaches from the earliest of them to the latest. In ground range the
      * samples of the first line are taken as evenly spaced in time.
      * @return 0; 1, with nothing changed and nothing reported, for a grid that makes no image, a null, and a
      * raster that reaches beyond the bursts or has no line or no sample */

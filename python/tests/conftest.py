@@ -20,3 +20,15 @@ def tie_points(scene):
     lines = (DATA / "scenes" / (scene + "_tie_points.csv")).read_text().splitlines()
     rows = [line.split(",")[:5] for line in lines if line[0].isdigit()]
     return np.array(rows, np.float64).T
+
+
+def write_model(path, heights, corner, step, crs="EPSG:4326"):
+    """An elevation model whose north-west corner is told."""
+    import rasterio
+
+    rows, columns = heights.shape
+    shape = {"height": rows, "width": columns, "count": 1, "dtype": "float32"}
+    transform = rasterio.transform.from_origin(*corner, step, step)
+    with rasterio.open(path, "w", driver="GTiff", crs=crs, transform=transform, **shape) as file:
+        file.write(heights.astype(np.float32), 1)
+    return path

@@ -6,10 +6,10 @@ import pickle
 import numpy as np
 import pytest
 import quo_base
-from conftest import DATA, SCENES
+from conftest import DATA, SCENES, write_model
 from quo_base import Job, Product, geocode, run
 
-rasterio = pytest.importorskip("rasterio")
+pytest.importorskip("rasterio")
 pyproj = pytest.importorskip("pyproj")
 pytest.importorskip("xarray")
 LINES, SAMPLES = 600, 2000
@@ -30,15 +30,6 @@ def product(tmp_path_factory):
         writer[:] = 1.0 + np.cos(2 * np.pi * 120 * seen.latitude)
     made.save(path + ".hdr", exact=True)
     return Product(path + ".hdr")
-
-
-def write_model(path, heights, corner, step, crs="EPSG:4326"):
-    transform = rasterio.transform.from_origin(*corner, step, step)
-    rows, columns = heights.shape
-    shape = {"height": rows, "width": columns, "count": 1, "dtype": "float32"}
-    with rasterio.open(path, "w", driver="GTiff", crs=crs, transform=transform, **shape) as file:
-        file.write(heights.astype(np.float32), 1)
-    return path
 
 
 @pytest.fixture

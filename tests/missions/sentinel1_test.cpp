@@ -470,6 +470,13 @@ TEST(Sentinel1, NeverReplacesTheProductsOwnFiles) {
     quo_import_result result{};
     ASSERT_EQ(import_safe(safe.path(), raster, result, nullptr, true), 0) << result.message;
     EXPECT_EQ(import_safe(safe.path(), raster, result), 1);  // through the link that the first one left
+    Safe other{folder, kGrd};
+    other.shrink(true);
+    write_tiff(other.measurement(), kDetected, 40, 30, true);
+    EXPECT_EQ(import_safe(other.path(), raster, result), 1);  // nor another product
+    fs::create_directory(folder.file("taken"));
+    EXPECT_EQ(import_safe(safe.path(), folder.file("taken"), result, nullptr, true), 5);
+    EXPECT_TRUE(fs::is_directory(folder.file("taken")));
     EXPECT_EQ(import_safe(safe.path(), safe.measurement(), result, nullptr, true), 1);
     EXPECT_EQ(import_safe(safe.path(), safe.measurement(), result), 1);
     EXPECT_EQ(import_safe(safe.path(), raster, result, nullptr, true), 0) << result.message;  // a link for a link

@@ -42,6 +42,21 @@ protected:
     test::TemporaryFolder folder_;
 };
 
+// A linked raster is the delivered file itself.
+TEST_P(Imported, NeverWritesIntoAMeasurement) {
+    const std::string file = folder_.file("delivered"), link = folder_.file("link");
+    test::write_text(file, test::read_text(raster()));
+    std::filesystem::create_symlink(file, link);
+    test::write_text(link + ".hdr", test::read_text(header()));
+    for (const char* verb : {"convert", "resample"}) {
+        const auto refused = test::quo({verb, link, link, "--lines", "50"});
+        EXPECT_NE(refused.exit_status, 0);
+        EXPECT_NE(test::quo({verb, raster(), link, "--lines", "50"}).exit_status, 0);
+    }
+    EXPECT_EQ(test::quo({"convert", link, link, "--lines", "0:50"}).exit_status, 1);
+    EXPECT_EQ(test::read_text(file), test::read_text(raster()));
+}
+
 // Of bursts, whose lines are more than the region's, no less than of an image without. What was cut out of one is
 // as right; headers and rasters that are none of each other's are not.
 TEST_P(Imported, IsRightUntilHeaderAndRasterPart) {
@@ -51,10 +66,14 @@ TEST_P(Imported, IsRightUntilHeaderAndRasterPart) {
     EXPECT_EQ(test::quo({"validate", part}).out, "0 errors, 0 warnings\n");
 
     const bool bursts = GetParam().safe == test::kSlc;
+    // Lines 1400 to 1599 are the last of a burst and the first of the next, which begins 159 lines before its end.
+    EXPECT_EQ(test::quo({"get", part + ".hdr", "ROI/Lines"}).out, bursts ? "159\n" : "200\n");
+    EXPECT_EQ(test::quo({"convert", part, folder_.file("few"), "--lines", "90:110"}).exit_status, 0);
+    EXPECT_EQ(test::quo({"validate", folder_.file("few")}).out, "0 errors, 0 warnings\n");
     const struct {
         const char *from, *to, *finding;
     } kSpoilt[] = {
-        {"<NrOfLinesPerImage>200<", "<NrOfLinesPerImage>199<", "warning  ROI/Lines  "},
+        {"<NrOfLinesPerImage>200<", "<NrOfLinesPerImage>99<", "warning  ROI/Lines  "},
         {"<FirstLine>1400<", "<FirstLine>1300<", "warning  ROI/SlowStartTime  "},
         {"<FirstSample>7<", "<FirstSample>9<", "warning  ROI/FastStartTime  "},
         {"<LineStep_s>", "<LineStep_s>x", "error  ImageGrid/-  makes no pixel grid"},

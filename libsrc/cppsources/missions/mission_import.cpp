@@ -184,8 +184,12 @@ private:
     }
     void put_in_place(std::error_code& error) {
         std::error_code unknown;
-        if (fs::symlink_status(raster_, unknown).type() == fs::file_type::not_found)
-            return fs::rename(beside_, raster_, error);
+        const fs::file_type there = fs::symlink_status(raster_, unknown).type();
+        if (there == fs::file_type::not_found) return fs::rename(beside_, raster_, error);
+        if (there != fs::file_type::regular && there != fs::file_type::symlink) {
+            error = std::make_error_code(std::errc::file_exists);
+            return;
+        }
         exchanged_ = exchange();
         if (!exchanged_) error.assign(errno, std::generic_category());
     }
@@ -232,10 +236,14 @@ private:
     BufferFile raster_;
 };
 
-/** Refuses to replace a file of the product itself: an older import may have left a link to it. Only a link takes
- * the place of a link. */
+/** Refuses to replace a file of the product itself, and what a link leads to: an older import may have left one to
+ * a measurement. Only a link takes the place of a link. */
 void require_apart(const quo_import_request& request, const Sentinel1Files& files) {
     const std::string raster = request.raster, orbit{text_or_empty(request.orbit_file)};
+    std::error_code unknown;
+    if (request.link == 0 && fs::is_symlink(raster, unknown))
+        refuse(QUO_REFUSED, raster + ": is a link to " + fs::read_symlink(raster, unknown).string() +
+                                ", whose samples would be replaced; remove it first, or name another raster");
     for (const std::string& out : {raster, raster + ".hdr", raster + ".antenna", raster + ".antenna.hdr"})
         for (const std::string& in : {files.measurement, files.annotation, files.manifest, orbit}) {
             std::error_code error;

@@ -419,12 +419,11 @@ struct TiePoints {
     }
     [[nodiscard]] std::size_t count() const { return line.size(); }
 
-    /** When the orbit sees them; false where it does not see them all. */
+    /** When the orbit sees them; not-a-number for those that it does not see. False where it sees none. */
     bool find_times(const GeneralSAROrbit& orbit) {
-        std::vector<std::int32_t> status(count());
         OrbitTargets targets{count(), latitude.data(), longitude.data(), height_m.data()};
-        return orbit.earth2sat(targets, {azimuth_s.data(), range_s.data(), status.data()}) == QUO_OK &&
-               std::ranges::all_of(status, [](std::int32_t s) { return s == QUO_OK; });
+        return orbit.earth2sat(targets, {azimuth_s.data(), range_s.data(), nullptr}) == QUO_OK &&
+               std::ranges::any_of(azimuth_s, [](double t) { return std::isfinite(t); });
     }
 };
 
@@ -439,7 +438,7 @@ void find_delay(const TiePoints& ties, ImageGrid_Obj& grid) {
     double sum_s = 0.0;
     int count = 0;
     for (std::size_t i = 0; i < ties.count(); ++i) {
-        if (std::isnan(line_s[i])) continue;  // in no burst
+        if (std::isnan(line_s[i] + ties.azimuth_s[i])) continue;  // in no burst, or not seen
         sum_s += ties.range_s[i] - (ties.azimuth_s[i] - line_s[i]) / kShare;
         ++count;
     }
@@ -515,19 +514,19 @@ void describe_sentinel1(const Sentinel1Files& files, const std::string& orbit_fi
     product.lines = a.lines;
     product.samples = a.samples;
     product.is_complex = !a.detected;
-    if (orbit_file.empty())
-        set_orbit(header, stated_vectors(a), files.annotation);
-    else
-        set_orbit(header, read_orbit_file(orbit_file, a.header.text("missionId"), a.first_line, a.last_line),
-                  orbit_file);
+    set_orbit(header, stated_vectors(a), files.annotation);
     set_sampling(a, header);
     set_swath(a, header);
     set_data_set(a, files, header);
     set_grid(a, product.grid);
     TiePoints ties{a};
-    const bool seen = ties.count() > 0 && ties.find_times(header.orbit);
-    if (seen) find_delay(ties, product.grid);
-    if (seen) product.ties = compare(ties, product.grid, header.orbit);
+    if (ties.find_times(header.orbit)) find_delay(ties, product.grid);
+    // The tie points are of the annotation's own orbit: by another one the delay would take up what that one
+    // mends.
+    if (!orbit_file.empty())
+        set_orbit(header, read_orbit_file(orbit_file, a.header.text("missionId"), a.first_line, a.last_line),
+                  orbit_file);
+    if (ties.find_times(header.orbit)) product.ties = compare(ties, product.grid, header.orbit);
     set_region(a, product.grid, header);
     set_polynomials(a, product.grid, header);
     set_attitude(a, product.grid, header);

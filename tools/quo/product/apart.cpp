@@ -6,6 +6,20 @@
 #include "product.h"
 
 namespace tool {
+namespace {
+
+/** What a link leads to is replaced where it lies. A file without a description of its own is none of ours: it may
+ * be a measurement that an import has left in its place. */
+void require_own_raster(const std::string& out) {
+    std::error_code error;
+    if (!std::filesystem::is_symlink(out, error)) return;
+    const std::string target = std::filesystem::weakly_canonical(out, error).string();
+    if (!std::filesystem::exists(target, error) || std::filesystem::exists(target + ".hdr", error)) return;
+    throw Failure(out + ": is a link to " + target + ", which has no description of its own; name another output");
+}
+
+}  // namespace
+
 bool same_file(const std::string& a, const std::string& b) {
     std::error_code error;
     return std::filesystem::is_regular_file(a, error) && std::filesystem::equivalent(a, b, error);
@@ -32,8 +46,9 @@ void require_apart(const std::vector<std::string>& read, const std::vector<std::
 }
 
 void require_raster_apart(const std::string& in, const std::string& out) {
-    if (same_file(out, in) && same_file(out + ".hdr", in + ".hdr")) return;
-    require_apart(raster_files(in), raster_files(out));
+    const bool in_place = same_file(out, in) && same_file(out + ".hdr", in + ".hdr");
+    if (!in_place) require_apart(raster_files(in), raster_files(out));
+    require_own_raster(out);
 }
 
 }  // namespace tool

@@ -44,6 +44,8 @@ void show(const ImportOptions& options, const quo_import_result& result) {
                 fixed(ties.most_line, 5) + ", samples rms " + fixed(ties.rms_sample, 5) + " max " +
                 fixed(ties.most_sample, 5) + ", ground rms " + fixed(ties.rms_ground_m, 4) + " m max " +
                 fixed(ties.most_ground_m, 4) + " m\n";
+    else
+        text += "no tie points that the orbit sees: line times may keep up to 0.13 lines of the range's delay\n";
     print(text);
 }
 

@@ -14,6 +14,9 @@
 #include "output.h"
 #include "progress.h"
 #include "quo_base/acquisition.h"
+#include "quo_base/derived_raster.h"
+#include "quo_base/generalSAR.h"
+#include "quo_base/image_grid.h"
 #include "raster.h"
 #include "spectrum_picture.h"
 #include "transform.h"
@@ -181,6 +184,12 @@ struct Rates {
 
 Rates rates_of(const std::string& header) {
     if (header.empty()) return {};
+    // The image's own rates; those of the constants are the recording's, which bursts and multilooked images
+    // leave.
+    GeneralSAR product;
+    ImageGrid_Obj grid;
+    if (product.GSread(header.c_str()) == QUO_OK && read_image_grid(header.c_str(), product, grid) == QUO_OK)
+        return grid.GroundLists > 0 ? Rates{} : Rates{true, 1.0 / grid.SampleStep_s, 1.0 / grid.LineStep_s};
     SamplingConstants_Obj constants;
     if (constants.readhdr(header.c_str()) != QUO_OK) throw Failure(header + ": no sampling constants");
     if (!(constants.frg_hz > 0.0) || !(constants.prf_hz > 0.0))

@@ -30,11 +30,15 @@ public:
         change_rates(product_.samplingConstants);
         const int status = grid_.cut(how_.first_line, how_.first_sample, how_.line_step, how_.sample_step);
         if (status != QUO_OK) return status;
-        moved_ = product_.GSexists(gsRoi) && grid_.getRegion(&product_.roi.Roi, raster_.NrOfLinesPerImage,
-                                                             raster_.NrOfPixelsPerLine) == QUO_OK;
+        moved_ = product_.GSexists(gsRoi);
+        if (moved_)
+            if (const int unplaced =
+                    grid_.getRegion(&product_.roi.Roi, raster_.NrOfLinesPerImage, raster_.NrOfPixelsPerLine))
+                return unplaced;
         for (GeneralSAR_Base* const object :
              {static_cast<GeneralSAR_Base*>(&grid_), static_cast<GeneralSAR_Base*>(&product_.roi.Roi),
-              static_cast<GeneralSAR_Base*>(&product_.samplingConstants)})
+              static_cast<GeneralSAR_Base*>(&product_.samplingConstants),
+              static_cast<GeneralSAR_Base*>(&product_.pulse)})
             object->setExactNumbers(true);
         if (const int failed = grid_.writehdr(header)) return failed;
         return write_changed(header);
@@ -46,13 +50,18 @@ private:
     void change_rates(SamplingConstants_Obj& sampling) {
         if (!product_.GSexists(gsSamplingConstants)) return;
         if (how_.sample_step != 1.0 && grid_.GroundLists == 0 && almost(sampling.Trg_s, grid_.SampleStep_s)) {
+            double& chirp_hz = product_.pulse.PulseSamplingRate;
+            const bool chirp = almost(chirp_hz, sampling.frg_hz);
             sampling.Trg_s *= how_.sample_step;
             sampling.frg_hz = 1.0 / sampling.Trg_s;
+            sampling.Brg_hz = std::min(sampling.Brg_hz, sampling.frg_hz);
+            if (chirp) chirp_hz = sampling.frg_hz;
             rates_ = true;
         }
         if (how_.line_step != 1.0 && almost(sampling.pri_s, grid_.LineStep_s)) {
             sampling.pri_s *= how_.line_step;
             sampling.prf_hz = 1.0 / sampling.pri_s;
+            sampling.Baz_hz = std::min(sampling.Baz_hz, sampling.prf_hz);
             rates_ = true;
         }
     }
@@ -60,6 +69,8 @@ private:
         if (moved_) (void)product_.roi.writehdr(header);
         if (rates_)
             if (const int status = product_.samplingConstants.writehdr(header)) return status;
+        if (rates_ && product_.GSexists(gsPulse))
+            if (const int status = product_.pulse.writehdr(header)) return status;
         // The data set tells the look side.
         const bool corners = moved_ && product_.GSexists(gsGeoCoords) && product_.GSexists(gsOrbit) &&
                              product_.GSexists(gsDataSetInfo) &&

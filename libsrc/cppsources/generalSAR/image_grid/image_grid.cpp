@@ -7,6 +7,7 @@
 #include <optional>
 #include <span>
 #include <type_traits>
+#include <utility>
 
 #include "diagnosticslib/call_frame.h"
 #include "quo_base/geometry.h"
@@ -85,6 +86,20 @@ public:
         if (!(burst >= 0.0 && burst < grid_.Bursts)) return std::nullopt;
         return grid_.BurstStart_s[static_cast<std::size_t>(burst)] +
                (k - burst * grid_.LinesPerBurst) * grid_.LineStep_s;
+    }
+    /** The earliest and the latest time of so many lines of the raster; nothing where one is in no burst. */
+    [[nodiscard]] std::optional<std::pair<double, double>> ends_of(std::int32_t lines) const {
+        const auto first = line_time(0.0), last = line_time(lines - 1.0);
+        if (!first || !last) return std::nullopt;
+        std::pair ends{*first, *last};
+        if (grid_.Bursts == 0) return ends;
+        // Each burst begins before the one before it ends.
+        const double length = grid_.LinesPerBurst, burst = std::floor((grid_.FirstLine + 0.5) / length);
+        for (double line = (burst + 1.0) * length - grid_.FirstLine; line < lines; line += length) {
+            ends.first = std::min(ends.first, line_time(line).value_or(ends.first));
+            ends.second = std::max(ends.second, line_time(line - 1.0).value_or(ends.second));
+        }
+        return ends;
     }
     [[nodiscard]] double range_time(double sample, double line_time_s) const {
         const double k = sample + grid_.FirstSample;
@@ -186,13 +201,14 @@ int Obj::setRegion(const ROI_Obj& region) {
 int Obj::getRegion(ROI_Obj* region, std::int32_t lines, std::int32_t samples) const {
     if (!region || lines < 1 || samples < 1 || !isComplete()) return QUO_REFUSED;
     const Axes axes{*this};
-    const auto first_s = axes.line_time(0.0), last_s = axes.line_time(lines - 1.0);
-    if (!first_s || !last_s) return QUO_REFUSED;
-    const double near_s = axes.range_time(0.0, *first_s), far_s = axes.range_time(samples - 1.0, *first_s);
-    const double covered = Bursts == 0 ? lines : std::round((*last_s - *first_s) / LineStep_s) + 1.0;
+    const auto times = axes.ends_of(lines);
+    if (!times) return QUO_REFUSED;
+    const auto [first_s, last_s] = *times;
+    const double near_s = axes.range_time(0.0, first_s), far_s = axes.range_time(samples - 1.0, first_s);
+    const double covered = Bursts == 0 ? lines : std::round((last_s - first_s) / LineStep_s) + 1.0;
     const bool possible = covered >= 1.0 && covered <= std::numeric_limits<std::int32_t>::max();
     if (!possible || !std::isfinite(near_s + far_s)) return QUO_REFUSED;
-    region->SetSlowAxe(Epoch_s + *first_s, LineStep_s, static_cast<int>(covered));
+    region->SetSlowAxe(Epoch_s + first_s, LineStep_s, static_cast<int>(covered));
     region->SetFastAxe(near_s, GroundLists == 0 ? SampleStep_s : (far_s - near_s) / std::max(1, samples - 1),
                        samples);
     return QUO_OK;
