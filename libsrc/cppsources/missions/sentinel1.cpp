@@ -324,6 +324,12 @@ void set_ground_polynomials(const Annotation& a, const ImageGrid_Obj& grid, poly
     }
 }
 
+/** Processors before version 2.43 state the three coefficients one by one. */
+std::vector<double> fm_rate_terms(const Element& rate) {
+    if (rate.find("azimuthFmRatePolynomial")) return rate.numbers("azimuthFmRatePolynomial");
+    return {rate.number("c0"), rate.number("c1"), rate.number("c2")};
+}
+
 void set_polynomials(const Annotation& a, const ImageGrid_Obj& grid, GeneralSAR& product) {
     const auto centroids = a.root.list("dopplerCentroid/dcEstimateList", "dcEstimate");
     const auto rates = a.general.list("azimuthFmRateList", "azimuthFmRate");
@@ -339,8 +345,8 @@ void set_polynomials(const Annotation& a, const ImageGrid_Obj& grid, GeneralSAR&
         take_terms(centroids[i], centroids[i].time("azimuthTime"), centroids[i].number("t0"),
                    centroids[i].numbers(terms), set.DC[i]);
     for (std::size_t i = 0; i < rates.size(); ++i)
-        take_terms(rates[i], rates[i].time("azimuthTime"), rates[i].number("t0"),
-                   rates[i].numbers("azimuthFmRatePolynomial"), set.FR[i]);
+        take_terms(rates[i], rates[i].time("azimuthTime"), rates[i].number("t0"), fm_rate_terms(rates[i]),
+                   set.FR[i]);
     set_ground_polynomials(a, grid, set);
     const polyDC broadside{};
     (void)product.orbit.SVGetSlantToAnglesPolys(&product.roi.Roi, &broadside, &set.SL2THETA[0], &set.SL2PHI[0]);

@@ -1,5 +1,6 @@
 #include "quo_base/derived_raster.h"
 
+#include <algorithm>
 #include <cmath>
 #include <memory>
 #include <string>
