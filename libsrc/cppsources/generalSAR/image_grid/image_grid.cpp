@@ -94,8 +94,9 @@ public:
         std::pair ends{*first, *last};
         if (grid_.Bursts == 0) return ends;
         // Each burst begins before the one before it ends.
-        const double length = grid_.LinesPerBurst, burst = std::floor((grid_.FirstLine + 0.5) / length);
-        for (double line = (burst + 1.0) * length - grid_.FirstLine; line < lines; line += length) {
+        for (std::int32_t burst = 1; burst < grid_.Bursts; ++burst) {
+            const double line = static_cast<double>(burst) * grid_.LinesPerBurst - grid_.FirstLine;
+            if (!(line > 0.0 && line < lines)) continue;
             ends.first = std::min(ends.first, line_time(line).value_or(ends.first));
             ends.second = std::max(ends.second, line_time(line - 1.0).value_or(ends.second));
         }
