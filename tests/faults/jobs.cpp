@@ -68,7 +68,7 @@ Run use_orbit(Folder folder) {
         if (status == 0) status = record->readhdr(file);
         if (status == 0) status = read->readhdr(file);
         if (status == 0) status = read->clone(copy.get());
-        if (status == 0) status = copy->SVResample(3.0);
+        if (status == 0) status = copy->SVResample(9.0);
         if (status == 0) status = copy->SVCheck(findings);
         for (const auto& orbit : {read, copy})
             judged(0, (orbit->pSV_m != nullptr) == (orbit->nSV_n > 0) && !orbit->pSV_m == !orbit->vSV_mOs);
