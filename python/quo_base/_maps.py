@@ -49,7 +49,10 @@ class Terrain(NamedTuple):
             if file.crs is None:
                 raise ValueError(f"{path}: has no coordinate reference system")
             geoid = _geoid_of(path, file.crs, heights)
-            made = cls(os.fspath(path), _horizontal(file.crs.to_wkt()), tuple(file.transform)[:6], file.shape, file.nodata, geoid)
+            if file.transform.b or file.transform.d:
+                raise ValueError(f"{path}: its rows do not run along the axes; warp it first")
+            crs, transform = _horizontal(file.crs.to_wkt()), tuple(file.transform)[:6]
+            made = cls(os.fspath(path), crs, transform, file.shape, file.nodata, geoid)
         made._to_ellipsoid()
         return made
 
@@ -71,11 +74,8 @@ class Terrain(NamedTuple):
         from rasterio.windows import Window
 
         x, y = _transformer("EPSG:4326", self.crs).transform(longitude, latitude)
-        a, b, c, d, e, f = self.transform
-        # Centres of pixels have whole numbers.
-        determinant = a * e - b * d
-        column = (e * (x - c) - b * (y - f)) / determinant - 0.5
-        row = (a * (y - f) - d * (x - c)) / determinant - 0.5
+        a, _, c, _, e, f = self.transform
+        column, row = (x - c) / a - 0.5, (y - f) / e - 0.5  # centres of pixels have whole numbers
         window = _window(row, column, self.shape, 1)
         if window is None:
             return np.full(np.shape(longitude), np.nan)
@@ -116,6 +116,8 @@ class MapGrid(NamedTuple):
     @classmethod
     def over(cls, product: Any, terrain: Terrain, crs: Any, spacing: Optional[float]) -> MapGrid:
         """The part of the model's grid, or of a wanted one, that the image may reach."""
+        if spacing is not None and not (spacing > 0 and np.isfinite(spacing)):
+            raise ValueError(f"a spacing of {spacing} makes no map")
         wanted = terrain.crs if crs is None else _horizontal(crs)
         x, y = _transformer("EPSG:4326", wanted).transform(*_outline(product, terrain))
         if crs is None and spacing is None:

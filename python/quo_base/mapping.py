@@ -27,6 +27,11 @@ QUANTITIES: dict[str, tuple[str, str]] = {
 """What can be had on the map: name, unit and meaning."""
 
 
+# Terrain hides or overlays what lies so many times its height away at most: the cotangent of the steepest look, and
+# the tangent of the flattest, of imaging radars in orbit (20 to 60 degrees of incidence).
+_STEEPEST = 2.75
+
+
 class _Job(NamedTuple):
     """All that a tile of the map is made of: paths and numbers, so that it travels to other machines."""
 
@@ -49,7 +54,6 @@ class _Tile:
         self._job = job
         self._product = product
         self._inner = (slice(0, rows), slice(0, columns))
-        self._margin = 0
         self._place = (row, column, rows, columns)
         self._locate(self._reach(product) if self._needs_terrain() else 0)
 
@@ -77,7 +81,6 @@ class _Tile:
 
     def _locate(self, margin: int) -> None:
         row, column, rows, columns = self._place
-        self._margin = margin
         self._inner = (slice(margin, margin + rows), slice(margin, margin + columns))
         around = (row - margin, column - margin, rows + 2 * margin, columns + 2 * margin)
         self.longitude, self.latitude, self.height = self._heights(*around)
@@ -113,7 +116,8 @@ class _Tile:
     def _sight(self) -> tuple[np.ndarray, np.ndarray]:
         """Unit vectors from the ground to the platform, and the ground, both (rows, columns, 3), Earth-fixed."""
         ground = _maps.earth_fixed(self.latitude, self.longitude, self.height)
-        platform = self._product.orbit.position(np.where(np.isfinite(self.seen.azimuth_time), self.seen.azimuth_time, self._product.orbit.first_time))
+        orbit, time = self._product.orbit, self.seen.azimuth_time
+        platform = orbit.position(np.where(np.isfinite(time), time, orbit.first_time))
         line = platform - ground
         return line / np.linalg.norm(line, axis=-1, keepdims=True), ground
 
@@ -131,11 +135,6 @@ class _Tile:
         return _maps.layover_and_shadow(
             self.height, np.radians(self._incidence_of_all()), steps, self._job.grid.pixel_m, self._inner
         )
-
-
-# Terrain hides or overlays what lies so many times its height away at most: the cotangent of the steepest look, and
-# the tangent of the flattest, of imaging radars in orbit (20 to 60 degrees of incidence).
-_STEEPEST = 2.75
 
 
 def geocode(

@@ -9,7 +9,7 @@ import quo_base
 from conftest import DATA, SCENES, write_model
 from quo_base import Job, Product, geocode, run
 
-pytest.importorskip("rasterio")
+rasterio = pytest.importorskip("rasterio")
 pyproj = pytest.importorskip("pyproj")
 pytest.importorskip("xarray")
 LINES, SAMPLES = 600, 2000
@@ -91,9 +91,13 @@ def test_heights_of_a_geoid_are_converted_or_refused_and_never_mixed(product, fl
     with pytest.raises(ValueError, match="no place in common"):
         far = write_model(tmp_path / "far.tif", np.zeros((9, 9)), (150.0, 10.0), 1e-3)
         geocode(product, far, heights="ellipsoid")
-    for wrong in ({"resampling": "cubic"}, {"quantities": []}, {"quantities": ["height", "slope"]}, {"heights": "sea"}):
+    for wrong in ({"resampling": "cubic"}, {"quantities": []}, {"quantities": ["height", "slope"]}, {"heights": "sea"}, {"spacing": -1.0}):
         with pytest.raises(ValueError):
             geocode(product, flat, **{"heights": "ellipsoid", **wrong})
+    with rasterio.open(flat, "r+") as file:
+        file.transform = rasterio.Affine(1e-4, 2e-5, file.transform.c, 2e-5, -1e-4, file.transform.f)
+    with pytest.raises(ValueError, match="along the axes"):
+        geocode(product, flat, heights="ellipsoid")
 
 
 def _write(path, text, fail_once=None):
