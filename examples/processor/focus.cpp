@@ -157,6 +157,7 @@ private:
             raw_.readbuffer(samples, first + line, 1, 0, 0);
             std::fill(samples + count, samples + block.samples(), fcomplex{});
         }
+        std::fill(block.line(lines), block.line(block.lines()), fcomplex{});
     }
 
     const Processor& processor_;
