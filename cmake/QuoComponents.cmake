@@ -5,6 +5,8 @@
 add_library(quo_flags INTERFACE)
 target_compile_options(quo_flags INTERFACE
     -Wall -Wextra -Wpedantic -Wconversion -Wshadow -Wformat=2
+    # Of which clang's counts every int that indexes a container of the standard library.
+    $<$<CXX_COMPILER_ID:Clang>:-Wno-sign-conversion>
     -fno-semantic-interposition
     # Results must not hang on which operations the compiler chose to fuse.
     -ffp-contract=off)
