@@ -5,7 +5,13 @@ foreach(component IN ITEMS runtime development tools)
     set(stage "${CPACK_TEMPORARY_DIRECTORY}/${component}/usr")
     set(folder "${stage}/share/doc/${CPACK_DEBIAN_${upper}_PACKAGE_NAME}")
     file(MAKE_DIRECTORY "${folder}")
+    # What is installed as the project's documents is the package's here, where the licence has a place of its own.
+    file(GLOB documents "${stage}/share/doc/quo_base/*")
+    list(REMOVE_ITEM documents "${stage}/share/doc/quo_base/LICENSE")
+    file(COPY ${documents} DESTINATION "${folder}")
+    file(REMOVE_RECURSE "${stage}/share/doc/quo_base")
     file(COPY_FILE "${CMAKE_CURRENT_LIST_DIR}/debian/copyright" "${folder}/copyright")
+    file(COPY "${CMAKE_CURRENT_LIST_DIR}/../CHANGELOG.md" DESTINATION "${folder}")
     string(TIMESTAMP date "%a, %d %b %Y 00:00:00 +0000" UTC)
     file(WRITE "${folder}/changelog" "quo-base (${CPACK_PACKAGE_VERSION}) unstable; urgency=medium
 

@@ -17,6 +17,17 @@ foreach(package IN LISTS packages)
     run(dpkg-deb -x "${package}" "${root}")
 endforeach()
 set(prefix "${root}/usr")
+foreach(document IN ITEMS libquo-base1/NOTICE libquo-base1/CHANGELOG.md quo-tools/CHANGELOG.md
+        libquo-base-dev/docs/geolocation.md libquo-base-dev/examples/ground_point.cpp)
+    if(NOT EXISTS "${prefix}/share/doc/${document}")
+        message(FATAL_ERROR "No package has the document ${document}")
+    endif()
+endforeach()
+file(GLOB_RECURSE module "${prefix}/libquo_base_fftw.so")
+file(STRINGS "${module}" licence REGEX "This module contains FFTW.*GNU General Public License, version 3")
+if(NOT licence)
+    message(FATAL_ERROR "${module} does not tell its licence")
+endif()
 
 run(${CMAKE_COMMAND} -S "${SOURCE}" -B "${WORK}/build" -G Ninja -D CMAKE_BUILD_TYPE=Release
     "-DCMAKE_PREFIX_PATH=${prefix}" -D CMAKE_CXX_COMPILER=${CXX} -D CMAKE_C_COMPILER=${C})
