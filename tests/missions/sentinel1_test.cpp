@@ -110,6 +110,20 @@ TEST_P(Sentinel1Products, AgreeWithTheirTiePointsBothWays) {
         for (int i = 0; i < 3; ++i) found[i] = at.point_m[i] - xyz[i];
         ground_off_m = std::max(ground_off_m, std::hypot(found[0], found[1], found[2]));
     }
+    // Tie points at the image's corners, on the ellipsoid: of the first line near, of the last one far.
+    const geoCoords_Obj& corners = product.geoCoords;
+    const struct {
+        const geopoint& found;
+        double latitude_deg, longitude_deg;
+    } kCorners[] = {
+        {truth.grd ? corners.NorthEast : corners.SouthWest, truth.grd ? 42.37675280764677 : 40.94730650708858,
+         truth.grd ? 15.32209672548896 : 11.09455829575940},
+        {truth.grd ? corners.SouthWest : corners.SouthEast, truth.grd ? 41.28078026909404 : 41.10414993861531,
+         truth.grd ? 11.86800305333565 : 12.20787230443543}};
+    for (const auto& [found, latitude_deg, longitude_deg] : kCorners) {
+        EXPECT_NEAR(found.Latitude, latitude_deg, 1e-6);
+        EXPECT_NEAR(found.Longitude, longitude_deg, 1e-6);
+    }
     EXPECT_LT(line_off, truth.most_line);
     EXPECT_LT(sample_off, truth.most_sample);
     EXPECT_LT(ground_off_m, truth.most_ground_m);

@@ -7,6 +7,7 @@
 #include <span>
 #include <vector>
 
+#include "generalSAR/derived_raster/corner_points.h"
 #include "missions/orbit_file.h"
 #include "quo_base/MatrixAlgebraANSI.h"
 #include "quo_base/gen_utils.h"
@@ -271,7 +272,9 @@ void set_region(const Annotation& a, const ImageGrid_Obj& grid, GeneralSAR& prod
     if (!(step_s > 0.0 || a.samples == 1)) a.root.refuse("near and far range make no image");
     region.SetFastAxe(a.near_s, step_s, a.samples);
     product.GSenable(gsRoi);
-    if (product.orbit.SVGetGeoCoords(&product.geoCoords, &product.roi) == QUO_OK) product.GSenable(gsGeoCoords);
+    if (place_corners(grid, a.lines, a.samples, product) != QUO_OK)
+        a.root.refuse("the orbit does not see the image's corners");
+    product.GSenable(gsGeoCoords);
 }
 
 // --- Polynomials ------------------------------------------------------------------------------------------------

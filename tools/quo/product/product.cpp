@@ -5,6 +5,7 @@
 #include "document.h"
 #include "failure.h"
 #include "quo_base/derived_raster.h"
+#include "quo_base/image_grid.h"
 #include "scene.h"
 
 namespace tool {
@@ -76,31 +77,36 @@ double last_line_time(const ROI_Obj& region) {
     return region.SlowStartTime + region.SlowTimeDelta * (region.Lines - 1);
 }
 
-std::vector<Corner> orbit_corners(GeneralSAR& product) {
-    const ROI_Obj& region = product.roi.Roi;
-    for (const GSObject needed : {gsOrbit, gsRoi, gsDataSetInfo}) {  // the last tells the look side
-        if (!product.GSexists(needed)) return {};
+std::vector<Corner> orbit_corners(const std::string& header, GeneralSAR& product) {
+    if (!product.GSexists(gsOrbit) || !product.GSexists(gsDataSetInfo)) return {};  // which tells the look side
+    if (!uneven_vectors(product.orbit).empty()) return {};
+    ImageGrid_Obj grid;
+    int lines = 0, samples = 0;
+    const RasterDescription* const raster = described_raster(product);
+    if (raster != nullptr && read_image_grid(header.c_str(), product, grid) == QUO_OK) {
+        lines = raster->NrOfLinesPerImage;
+        samples = raster->NrOfPixelsPerLine;
+    } else if (const ROI_Obj& region = product.roi.Roi;
+               product.GSexists(gsRoi) && region.isNULL() == 0 && grid.setRegion(region) == QUO_OK) {
+        lines = region.Lines;
+        samples = region.Samples;
     }
-    if (region.isNULL() != 0 || !uneven_vectors(product.orbit).empty()) return {};
-    // Of the last line and sample themselves: the region's lengths lead to the ones after them.
-    const double first_s = region.SlowStartTime, near_s = region.FastStartTime;
-    const double last_s = last_line_time(region);
-    const double far_s = near_s + region.FastTimeDelta * (region.Samples - 1);
-    const std::pair<double, double> places[] = {
-        {first_s, near_s}, {last_s, near_s}, {last_s, far_s}, {first_s, far_s}};
-    std::vector<Corner> corners;
-    for (const auto& [azimuth_s, range_s] : places) {
-        Corner corner{};
-        if (product.orbit.SVGetLatLon(azimuth_s, range_s, &corner.latitude_deg, &corner.longitude_deg) != 0)
+    if (lines == 0) return {};
+    const double last_line = lines - 1.0, last_sample = samples - 1.0;
+    const double at_line[] = {0.0, last_line, last_line, 0.0}, at_sample[] = {0.0, 0.0, last_sample, last_sample};
+    double azimuth_s[4], range_s[4];
+    if (grid.pixelTimes({4, at_line, at_sample}, {azimuth_s, range_s}) != QUO_OK) return {};
+    std::vector<Corner> corners(4);
+    for (std::size_t i = 0; i < corners.size(); ++i)
+        if (product.orbit.SVGetLatLon(azimuth_s[i], range_s[i], &corners[i].latitude_deg,
+                                      &corners[i].longitude_deg) != QUO_OK)
             return {};
-        corners.push_back(corner);
-    }
     return corners;
 }
 
-std::vector<Corner> corners_of(GeneralSAR& product) {
+std::vector<Corner> corners_of(const std::string& header, GeneralSAR& product) {
     std::vector<Corner> corners = grid_corners(product);
-    return corners.empty() ? orbit_corners(product) : corners;
+    return corners.empty() ? orbit_corners(header, product) : corners;
 }
 
 std::optional<std::string> raster_of(const std::string& header) {

@@ -36,9 +36,9 @@ struct Corner {
 };
 /** The corners of a product around its edge, from the corner grid, else as orbit_corners() finds them. Empty where
  * neither can be had. */
-std::vector<Corner> corners_of(GeneralSAR& product);
-/** The same from orbit, region and look side alone: of the first and the last line and sample. */
-std::vector<Corner> orbit_corners(GeneralSAR& product);
+std::vector<Corner> corners_of(const std::string& header, GeneralSAR& product);
+/** The same from orbit, pixel grid or region, and look side alone: of the first and the last line and sample. */
+std::vector<Corner> orbit_corners(const std::string& header, GeneralSAR& product);
 /** The same from the corner grid alone. */
 std::vector<Corner> grid_corners(const GeneralSAR& product);
 
