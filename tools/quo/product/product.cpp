@@ -2,6 +2,7 @@
 
 #include <cmath>
 
+#include "date.h"
 #include "document.h"
 #include "failure.h"
 #include "quo_base/derived_raster.h"
@@ -65,6 +66,24 @@ std::vector<Corner> grid_corners(const GeneralSAR& product) {
 bool is_told(std::string_view text) {
     return !text.empty() && text != "NOT_AVAILABLE" && text != "NOT SET" && text != "SENSOR UNKNOWN" &&
            !text.ends_with(" UNDEFINED");
+}
+
+Told::Told(const GeneralSAR& product) {
+    const DataSetInfo_Obj& info = product.dataSetInfo;
+    const auto text = [&](const char* field) {
+        return product.GSexists(gsDataSetInfo) && is_told(field) ? std::string{field} : std::string{};
+    };
+    mission = text(info.SensorName);
+    mode = text(info.AcquisitionMode);
+    swath = text(info.Swath);
+    polarization = text(info.Polarization);
+    orbit_number = text(info.OrbitNumber);
+    image_type = text(info.ImageType);
+    scene = text(info.SceneID);
+    if (product.GSexists(gsOrbit)) direction = product.orbit.isAscending() ? "ascending" : "descending";
+    if (!product.GSexists(gsRoi) || product.roi.Roi.isNULL() != 0) return;
+    start_time = iso_text(product.roi.Roi.SlowStartTime);
+    stop_time = iso_text(last_line_time(product.roi.Roi));
 }
 
 void read_region(const std::string& header, ROI_Obj& region) {

@@ -25,6 +25,15 @@ bool is_numeric_field(GeneralSAR& product, std::string_view field);
 /** Whether a text of the description tells something: it is none of the marks of a missing one. */
 bool is_told(std::string_view text);
 
+/** What a header tells of a product to those who look for one; texts are empty where it tells nothing. */
+struct Told {
+    explicit Told(const GeneralSAR& product);
+
+    std::string mission, mode, swath, polarization, orbit_number, image_type, scene;
+    std::string direction;              ///< of the orbit: "ascending", "descending"
+    std::string start_time, stop_time;  ///< of the region's first and last line, ISO 8601 in UTC
+};
+
 /** Reads a header's section ROI. Throws Failure where it is not there or holds no sample. */
 void read_region(const std::string& header, ROI_Obj& region);
 

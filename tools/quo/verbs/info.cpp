@@ -157,11 +157,17 @@ int show_info(const InfoOptions& options) {
     if (product.GSexists(gsOrbit)) add_orbit(facts, product.orbit);
     if (const RasterDescription* raster = described_raster(product)) add_raster(facts, *raster);
     if (product.GSexists(gsSamplingConstants)) add_sampling(facts, product);
-    add_geometry(facts, options.header, product);
+    int status = kFine;
+    try {
+        add_geometry(facts, options.header, product);
+    } catch (const Failure& damaged) {  // a grid that makes none takes nothing from what else is known
+        complain(damaged.what());
+        status = kFindings;
+    }
     add_corners(facts, options.header, product);
     add_objects(facts, product);
     options.json ? print_json(facts.json()) : print(facts.text(20));
-    return kFine;
+    return status;
 }
 
 }  // namespace
