@@ -5,6 +5,7 @@
 #include <cmath>
 #include <cstring>
 #include <filesystem>
+#include <regex>
 #include <string>
 #include <vector>
 
@@ -40,6 +41,12 @@ int import_safe(const std::string& source, const std::string& raster, quo_import
     request.orbit_file = orbit;
     request.link = link ? 1 : 0;
     return quo_import_sentinel1(&request, &result);
+}
+
+std::unique_ptr<quo::MissionProduct> described(const Safe& safe, const std::string& orbit = "") {
+    auto made = std::make_unique<quo::MissionProduct>();
+    quo::describe_sentinel1({safe.annotation().string(), "", ""}, orbit, *made);
+    return made;
 }
 
 // --- Times and tie points ---------------------------------------------------------------------------------------
@@ -79,8 +86,7 @@ TEST_P(Sentinel1Products, AgreeWithTheirTiePointsBothWays) {
     const std::string header = folder.file("scene.hdr");
     {
         // Without the measurement, whose zeros would fill gigabytes.
-        const auto made = std::make_unique<quo::Sentinel1Product>();
-        quo::describe_sentinel1({safe.annotation().string(), "", ""}, "", *made);
+        const auto made = described(safe);
         EXPECT_EQ(made->ties.count, truth.ties);
         EXPECT_LT(made->ties.most_line, truth.most_line);
         EXPECT_LT(made->ties.most_sample, truth.most_sample);
@@ -140,10 +146,37 @@ TEST(Sentinel1, DoesWithoutTiePointsInNoBurst) {
     const test::TemporaryFolder folder;
     Safe safe{folder, kSlc};
     safe.change("<line>3002<", "<line>4503<");
-    const auto made = std::make_unique<quo::Sentinel1Product>();
-    quo::describe_sentinel1({safe.annotation().string(), "", ""}, "", *made);
+    const auto made = described(safe);
     EXPECT_EQ(made->ties.count, 10);
     EXPECT_LT(made->ties.most_line, 0.001);
+}
+
+// The tie points are of the annotation's own orbit: another one must not change what they tell of the delay.
+TEST(Sentinel1, KeepsTheDelayUnderAnotherOrbit) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    Safe safe{folder, kSlc};
+    safe.change("2022-01-04T17:0", "2023-08-23T14:1");  // the day of the orbit file's vectors
+    const auto own = described(safe), other = described(safe, kOrbit);
+    EXPECT_EQ(own->grid.DelayShare, 0.5);
+    EXPECT_EQ(own->grid.DelayReference_s, other->grid.DelayReference_s);
+    EXPECT_NE(own->header.orbit.pSV_m[0], other->header.orbit.pSV_m[0]);
+}
+
+TEST(Sentinel1, TakesFmRatesInTheirOlderForm) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    const Safe safe{folder, kSlc};
+    const auto newer = described(safe);
+    const std::regex list{"<azimuthFmRatePolynomial[^>]*>(\\S+) (\\S+) (\\S+)</azimuthFmRatePolynomial>"};
+    test::write_text(safe.annotation(), std::regex_replace(test::read_text(safe.annotation()), list,
+                                                           "<c0>$1</c0><c1>$2</c1><c2>$3</c2>"));
+    const auto older = described(safe);
+    const polySAR &now = newer->header.polynomials, &then = older->header.polynomials;
+    ASSERT_EQ(now.nfr, then.nfr);
+    ASSERT_EQ(test::read_text(safe.annotation()).find("azimuthFmRatePolynomial"), std::string::npos);
+    EXPECT_LT(now.FR[0].pol[0], -2000.0);
+    for (int i = 0; i < now.nfr; ++i) EXPECT_TRUE(std::ranges::equal(now.FR[i].pol, then.FR[i].pol)) << i;
 }
 
 // --- Modes ------------------------------------------------------------------------------------------------------
@@ -457,6 +490,7 @@ TEST(Sentinel1, RefusesWhatDoesNotFitAndLeavesNothing) {
         {"orbit>", "arc>", "its state vectors make no orbit"},
         {"azimuthFmRatePolynomial count=\"3\">", "azimuthFmRatePolynomial count=\"3\">1 2 3 ",
          "a polynomial with more terms than are known"},
+        {"<slantRangeTime>5.3", "<slantRangeTime>0.3", ".xml: line 2: the orbit does not see the image's corners"},
     };
     for (const auto& [from, to, message] : kChanges) {
         const test::TemporaryFolder folder;
@@ -472,6 +506,36 @@ TEST(Sentinel1, RefusesWhatDoesNotFitAndLeavesNothing) {
         EXPECT_EQ(std::string{result.message}.find('\n'), std::string::npos);
         EXPECT_EQ(std::distance(fs::directory_iterator{folder.path()}, {}), 1) << from;
     }
+}
+
+TEST(Sentinel1, LeavesNothingOfAnOlderImportAndTellsItsBytes) {
+    const test::Report report;
+    const test::TemporaryFolder folder, other;
+    Safe slc{folder, kSlc}, grd{other, kGrd};
+    slc.shrink(false);
+    grd.shrink(true);
+    write_tiff(slc.measurement(), kPlain, 40, 30, true);
+    write_tiff(grd.measurement(), kDetected, 40, 30, true);
+    const std::string raster = folder.file("scene"), pattern = raster + ".antenna", source = grd.path();
+    quo_import_result result{};
+    ASSERT_EQ(import_safe(slc.path(), raster, result), 0) << result.message;
+    EXPECT_TRUE(fs::exists(pattern) && fs::exists(pattern + ".hdr"));
+    std::vector<std::int64_t> told;
+    quo_import_request request{};
+    request.source = source.c_str();
+    request.raster = raster.c_str();
+    request.context = &told;
+    request.progress = [](void* context, std::int64_t done, std::int64_t all) {
+        EXPECT_EQ(all, 40 * 30 * 4);
+        static_cast<std::vector<std::int64_t>*>(context)->push_back(done);
+        return 0;
+    };
+    ASSERT_EQ(quo_import_sentinel1(&request, &result), 0) << result.message;
+    EXPECT_EQ(told, (std::vector<std::int64_t>{0, 40 * 30 * 4}));
+    EXPECT_FALSE(fs::exists(pattern) || fs::exists(pattern + ".hdr"));
+    test::write_text(pattern + ".hdr", "notes");  // somebody's own
+    EXPECT_EQ(import_safe(grd.path(), raster, result), 0) << result.message;
+    EXPECT_EQ(test::read_text(pattern + ".hdr"), "notes");
 }
 
 TEST(Sentinel1, NeverReplacesTheProductsOwnFiles) {
