@@ -156,7 +156,10 @@ TEST(Sentinel1, KeepsTheDelayUnderAnotherOrbit) {
     const test::Report report;
     const test::TemporaryFolder folder;
     Safe safe{folder, kSlc};
-    safe.change("2022-01-04T17:0", "2023-08-23T14:1");  // the day of the orbit file's vectors
+    // The minutes of the orbit file's vectors.
+    for (const auto& [from, to] :
+         {std::pair{"17:04", "14:11"}, {"17:05", "14:12"}, {"17:06", "14:13"}, {"17:07", "14:14"}})
+        safe.change(std::string{"2022-01-04T"} + from, std::string{"2023-08-23T"} + to);
     const auto own = described(safe), other = described(safe, kOrbit);
     EXPECT_EQ(own->grid.DelayShare, 0.5);
     EXPECT_EQ(own->grid.DelayReference_s, other->grid.DelayReference_s);
