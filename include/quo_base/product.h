@@ -54,7 +54,8 @@ QUO_BASE_API int quo_product_close(quo_product* product) QUO_NOEXCEPT;
 
 /* ---- Values ----
  *
- * 1 also for a field that the product does not have. */
+ * 1 also for a field that the product does not have. Fields of "ImageGrid" are those of the grid that places the
+ * pixels, which a header without that section has of its region. */
 
 /** How many values a field has: 1 for a text, 0 for an array that the product does not fill. */
 QUO_BASE_API int quo_product_length(const quo_product* product, const char* field, size_t* length) QUO_NOEXCEPT;

@@ -87,6 +87,9 @@ TEST_P(Imported, IsRightUntilHeaderAndRasterPart) {
         test::write_text(part + ".hdr", spoilt);
         EXPECT_NE(test::quo({"validate", part}).out.find(finding), std::string::npos) << from;
     }
+    // Its fields are known as those of any other section.
+    for (const char* value : {"word", "-1"})
+        EXPECT_EQ(test::quo({"set", part + ".hdr", "ImageGrid/LineStep_s", value}).exit_status, 2);
     // All but the geometry is told of a product whose pixel grid is damaged.
     test::write_text(part + ".hdr", test::replaced(whole, "<LineStep_s>", "<LineStep_s>x"));
     const auto info = test::quo({"info", part}), vrt = test::quo({"vrt", part});

@@ -6,7 +6,7 @@
 #include "document.h"
 #include "failure.h"
 #include "quo_base/derived_raster.h"
-#include "quo_base/image_grid.h"
+#include "quorelxmllib/element_path.h"
 #include "scene.h"
 
 namespace tool {
@@ -36,19 +36,19 @@ const char* section_of(GeneralSAR& product, GSObject object) {
     return element != nullptr ? element->section : "";
 }
 
-const parElement* element_at(GeneralSAR& product, std::string_view field) {
+const parElement* Fields::at(std::string_view field) const {
     for (int i = gsRoi; i < GeneralSAR::kObjects; ++i) {
-        if (const parElement* element = product.GSelement(static_cast<GSObject>(i), field)) return element;
+        if (const parElement* element = product_.GSelement(static_cast<GSObject>(i), field)) return element;
     }
-    return nullptr;
+    return quo::element_at(grid_, field);
 }
 
-bool is_numeric_field(GeneralSAR& product, std::string_view field) {
+bool Fields::is_numeric(std::string_view field) const {
     // Polynomials and corner points stand in sections of their own, as many as there are.
     for (const char* nested : {"/pol", "/trg0_s", "/taz0_s", "/Point"}) {
         if (field.ends_with(nested)) return true;
     }
-    const parElement* element = element_at(product, field);
+    const parElement* element = at(field);
     return element != nullptr && element->type != parElement::typeString;
 }
 

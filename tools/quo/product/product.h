@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "quo_base/generalSAR.h"
+#include "quo_base/image_grid.h"
 
 namespace tool {
 
@@ -17,10 +18,19 @@ void read_product(const std::string& header, GeneralSAR& product);
 const GeneralSAR_Base& elements_of(GeneralSAR& product, GSObject object);
 /** The section that these stand in. */
 const char* section_of(GeneralSAR& product, GSObject object);
-/** The same, or null, for the element at a path such as "SamplingConstants/prf_hz". */
-const parElement* element_at(GeneralSAR& product, std::string_view field);
-/** Whether a field is known to hold numbers. */
-bool is_numeric_field(GeneralSAR& product, std::string_view field);
+
+/** The fields that headers have, with what new objects hold in them. */
+class Fields {
+public:
+    /** The element at a path such as "SamplingConstants/prf_hz"; null where no object has it. */
+    const parElement* at(std::string_view field) const;
+    /** Whether a field is known to hold numbers. */
+    bool is_numeric(std::string_view field) const;
+
+private:
+    GeneralSAR product_;
+    ImageGrid_Obj grid_;
+};
 
 /** Whether a text of the description tells something: it is none of the marks of a missing one. */
 bool is_told(std::string_view text);
