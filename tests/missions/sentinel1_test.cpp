@@ -511,6 +511,27 @@ TEST(Sentinel1, RefusesWhatDoesNotFitAndLeavesNothing) {
     }
 }
 
+TEST(Sentinel1, NamesTheFileThatIsDamaged) {
+    const test::Report report;
+    const test::TemporaryFolder folder, other;
+    Safe slc{folder, kSlc}, grd{other, kGrd};
+    slc.shrink(false);
+    write_tiff(slc.measurement(), {"", 32, SAMPLEFORMAT_COMPLEXINT, COMPRESSION_LZW, false, false, 16}, 40, 30,
+               true);
+    test::write_text(slc.measurement(), test::read_text(slc.measurement()).replace(8, 64, 64, '\xff'));
+    quo_import_result result{};
+    EXPECT_EQ(import_safe(slc.path(), folder.file("scene"), result), 4);
+    EXPECT_EQ(result.message, slc.measurement() + ": is cut short or damaged at line 0");
+    grd.change("<numberOfSamples>26102<", "<numberOfSamples>1<");
+    try {
+        (void)described(grd);
+        ADD_FAILURE() << "a conversion of one sample";
+    } catch (const quo::MissionRefusal& refusal) {
+        EXPECT_EQ(refusal.what(), grd.annotation().string() +
+                                      ": line 2: the conversion between slant and ground range has no fit");
+    }
+}
+
 TEST(Sentinel1, LeavesNothingOfAnOlderImportAndTellsItsBytes) {
     const test::Report report;
     const test::TemporaryFolder folder, other;

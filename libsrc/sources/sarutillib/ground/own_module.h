@@ -39,10 +39,9 @@ auto use_module(const std::string& file, const char* function, Use use) {
 template <typename Function, typename Use>
 auto use_own_module(const std::string& file, const char* function, Use use) {
     const std::string folder = own_folder();
-    decltype(use(Function{})) made = nullptr;
-    for (const char* const inner : {"quo_base/", ""})
-        if (!folder.empty() && !made) made = use_module<Function>(folder + inner + file, function, use);
-    return made;
+    if (folder.empty()) return decltype(use(Function{})){};
+    const auto made = use_module<Function>(folder + "quo_base/" + file, function, use);
+    return made ? made : use_module<Function>(folder + file, function, use);
 }
 
 }  // namespace quo
