@@ -57,7 +57,7 @@ def import_product(
 
     source: the product's folder, manifest or annotation; swath ("IW1") and polarization ("VV") where it has
     several; orbit_file: state vectors in place of the annotation's; link: do not copy samples that can be used as
-    they stand; progress: told of blocks done and of all; what it raises ends the import.
+    they stand; progress: told of bytes written and of all; what it raises ends the import.
     """
     orbit = None if orbit_file is None else os.fspath(orbit_file)
     name = os.fspath(raster)

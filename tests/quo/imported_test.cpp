@@ -87,6 +87,19 @@ TEST_P(Imported, IsRightUntilHeaderAndRasterPart) {
         test::write_text(part + ".hdr", spoilt);
         EXPECT_NE(test::quo({"validate", part}).out.find(finding), std::string::npos) << from;
     }
+    // Its fields are known as those of any other section.
+    for (const char* value : {"word", "-1"})
+        EXPECT_EQ(test::quo({"set", part + ".hdr", "ImageGrid/LineStep_s", value}).exit_status, 2);
+    // All but the geometry is told of a product whose pixel grid is damaged.
+    test::write_text(part + ".hdr", test::replaced(whole, "<LineStep_s>", "<LineStep_s>x"));
+    const auto info = test::quo({"info", part}), vrt = test::quo({"vrt", part});
+    EXPECT_EQ(info.exit_status + vrt.exit_status, 2);
+    EXPECT_NE(info.out.find("objects  "), std::string::npos);
+    EXPECT_EQ(test::read_text(part + ".vrt").find("<GCPList"), std::string::npos);
+    for (const std::string& line : {info.err, vrt.err}) {
+        EXPECT_NE(line.find("part.hdr: section ImageGrid: "), std::string::npos) << line;
+        EXPECT_EQ(std::ranges::count(line, '\n'), 1) << line;
+    }
 }
 
 // The ground makes a jump from burst to burst, and where the conversion to ground range changes: control points on

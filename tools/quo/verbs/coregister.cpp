@@ -6,7 +6,7 @@
 #include "product.h"
 #include "quo_base/Coregist.h"
 #include "quo_base/MatrixAlgebraANSI.h"
-#include "residuals.h"
+#include "sarutillib/ground/residuals.h"
 #include "scene.h"
 
 namespace tool {
@@ -88,7 +88,7 @@ void fit(const std::vector<Match>& matches, double Match::*time, const ROI_Obj& 
 }
 
 struct Agreement {
-    Residuals range_samples, azimuth_lines, back_samples, back_lines;
+    quo::Residuals range_samples, azimuth_lines, back_samples, back_lines;
 };
 
 Agreement judge(const std::vector<Match>& matches, const Coregist& mapping, const Image& master,
@@ -110,7 +110,7 @@ Agreement judge(const std::vector<Match>& matches, const Coregist& mapping, cons
 
 struct Row {
     const char *direction, *axis, *unit;
-    const Residuals& residuals;
+    const quo::Residuals& residuals;
 };
 std::array<Row, 4> rows_of(const Agreement& agreement) {
     return {{{"master to slave", "range", "samples", agreement.range_samples},

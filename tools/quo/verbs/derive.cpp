@@ -8,7 +8,7 @@
 #include "product.h"
 #include "quo_base/SARpolynomials.h"
 #include "quo_base/quorelxml_v2.h"
-#include "residuals.h"
+#include "sarutillib/ground/residuals.h"
 #include "scene.h"
 
 namespace tool {
@@ -49,7 +49,7 @@ struct Derived {
 struct Result {
     std::array<bool, kQuantities> wanted{}, kept{};
     Derived polynomials;
-    std::array<Residuals, kQuantities> residuals;
+    std::array<quo::Residuals, kQuantities> residuals;
 };
 
 std::array<std::int32_t, kQuantities> counts_of(const polySAR& set) {

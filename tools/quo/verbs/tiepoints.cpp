@@ -6,7 +6,7 @@
 #include <span>
 
 #include "commands.h"
-#include "residuals.h"
+#include "sarutillib/ground/residuals.h"
 #include "scene.h"
 #include "table.h"
 
@@ -45,7 +45,7 @@ struct Agreement {
     std::string scene;
     Vertical vertical = Vertical::kEllipsoidNormal;
     std::int64_t points = 0, unsolved = 0;
-    std::array<Residuals, kQuantities> residuals;  // in the order of kQuantity
+    std::array<quo::Residuals, kQuantities> residuals;  // in the order of kQuantity
 
     std::int64_t solved() const { return points - unsolved; }
 };
@@ -171,7 +171,7 @@ std::string as_row(const Agreement& agreement, std::size_t name_width) {
     const std::string name = shown(agreement.scene);
     std::string row = name + std::string(name_width - name.size(), ' ') +
                       padded(std::to_string(agreement.points), 8) + padded(std::to_string(agreement.solved()), 8);
-    for (const Residuals& residual : agreement.residuals)
+    for (const quo::Residuals& residual : agreement.residuals)
         for (const double value : {residual.largest(), residual.rms()})
             row += padded(agreement.solved() > 0 ? rough(value) : "-", kNumberWidth);
     return row + "\n";
