@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "date.h"
 #include "failure.h"
 #include "number.h"
 
@@ -26,6 +27,17 @@ std::size_t quoted_length(std::string_view text) {
 }
 
 }  // namespace
+
+std::optional<std::string> read_value(std::string_view field, std::string_view name, double& value) {
+    const bool time = name == kAzimuthTime;
+    const auto found = time ? time_of(unquoted(field)) : finite_number(field);
+    if (found) {
+        value = *found;
+        return std::nullopt;
+    }
+    return std::string{name} + " is \"" + std::string{field} + "\", " +
+           (time ? "neither a number nor a date" : "not a number");
+}
 
 bool split_fields(std::string_view line, std::vector<std::string_view>& fields) {
     fields.clear();
@@ -95,13 +107,9 @@ std::optional<std::string> Row::defect(std::size_t columns) const {
 std::vector<double> Table::numbers(std::span<const std::size_t> columns) const {
     if (const auto wrong = row_.defect(columns_.size())) throw Failure(place() + ": " + *wrong);
     std::vector<double> values;
-    for (const std::size_t column : columns) {
-        const auto number = finite_number(row_.fields()[column]);
-        if (!number)
-            throw Failure(place() + ": " + columns_[column] + " is \"" + std::string{row_.fields()[column]} +
-                          "\", not a number");
-        values.push_back(*number);
-    }
+    for (const std::size_t column : columns)
+        if (const auto wrong = read_value(row_.fields()[column], columns_[column], values.emplace_back()))
+            throw Failure(place() + ": " + *wrong);
     return values;
 }
 

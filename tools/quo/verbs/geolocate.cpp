@@ -33,7 +33,6 @@ struct Input {
     const char* name;
     double lowest = -std::numeric_limits<double>::max();
     double highest = std::numeric_limits<double>::max();
-    bool time = false;  // a date will do
 };
 
 /** Points that are solved together: what was read of them, and what is found. */
@@ -180,8 +179,7 @@ void to_pixels_precisely(const Scene& scene, GeneralSAROrbit& own, Points& point
     find_pixels(scene, points);
 }
 
-constexpr const char* kAzimuthTime = "azimuth_time_s";
-constexpr Input kSample[] = {{.name = kAzimuthTime, .time = true}, {"range_time_s"}};
+constexpr Input kSample[] = {{kAzimuthTime}, {"range_time_s"}};
 constexpr Input kPixel[] = {{"line"}, {"sample"}};
 constexpr Input kPoint[] = {{"latitude_deg", -90.0, 90.0}, {"longitude_deg", -360.0, 360.0}, kHeight};
 constexpr const char* kGeometry[] = {"x_m",           "y_m",           "z_m",         "latitude_deg",
@@ -245,15 +243,10 @@ private:
     static std::optional<std::string> read_one(const Row& row, const Input& input, std::size_t index,
                                                double& value) {
         const std::string_view text = row.fields()[index];
-        auto number = finite_number(text);
-        if (!number && input.time) number = date_of(text);
-        if (number && *number >= input.lowest && *number <= input.highest) {
-            value = *number;
-            return std::nullopt;
-        }
-        const std::string what = std::string{input.name} + " is \"" + std::string{text} + "\"";
-        if (!number) return what + (input.time ? ", neither a number nor a date" : ", not a number");
-        return what + ", outside " + fixed(input.lowest, 0) + " to " + fixed(input.highest, 0);
+        if (auto defect = read_value(text, input.name, value)) return defect;
+        if (value >= input.lowest && value <= input.highest) return std::nullopt;
+        return std::string{input.name} + " is \"" + std::string{text} + "\", outside " + fixed(input.lowest, 0) +
+               " to " + fixed(input.highest, 0);
     }
 
     std::size_t in_all_;
@@ -363,11 +356,10 @@ private:
         for (std::size_t k = 0; k < direction_->outputs.size(); ++k) {
             text += ',';
             if (status != 0) continue;
-            const std::string date = k == iso_at_ ? iso_text(points_.out[k][i]) : "";  // none before 1985
-            if (date.empty())
-                append_exact(text, points_.out[k][i]);
+            if (k == iso_at_)
+                text += iso_or_number(points_.out[k][i]);
             else
-                text += date;
+                append_exact(text, points_.out[k][i]);
         }
         text.append(",").append(std::to_string(status)).append("\n");
     }
@@ -463,7 +455,7 @@ constexpr const char* kDetails =
     "  radar:  reads latitude_deg, longitude_deg, height_m and, if there, doppler_hz; adds azimuth_time_s,\n"
     "          range_time_s, with --pixels line and sample, status\n"
     "Lines and samples count from 0 at the centre of the first; a point that two bursts see gets a row for each.\n"
-    "Azimuth times may be dates: \"04-JAN-2022 17:05:58.5\" or \"2022-01-04T17:05:58.5\".\n"
+    "Azimuth times may be dates: \"04-JAN-2022 17:05:58.5\" or \"2022-01-04T17:05:58.5Z\".\n"
     "Points of --to ground lie on the WGS84 ellipsoid, unless a column height_m or --height gives their heights.\n"
     "A computed column whose name is taken gets the prefix computed_.\n";
 
