@@ -83,19 +83,16 @@ void to_ground(const Scene& scene, GeneralSAROrbit& /*own*/, Points& points) {
     ground.status = points.status.data();
     require_solved(scene.orbit().sat2earth(samples, ground));
     for (std::size_t i = 0; i < points.count(); ++i)
-        if (!scene.covers(time_s[i])) points.status[i] = QUO_NOT_SEEN;
+        if (!std::isnan(time_s[i]) && !scene.covers(time_s[i])) points.status[i] = QUO_NOT_SEEN;
 }
 
-/** Of pixels, whose times are told too: then they take the places of lines and samples. */
+/** Of pixels, whose times take the places of lines and samples, and are told too. */
 void pixels_to_ground(const Scene& scene, GeneralSAROrbit& own, Points& points) {
-    std::vector<std::int32_t> outside(points.count());
-    const PixelTimes times{points.out[9].data(), points.out[10].data(), outside.data()};
-    require_solved(scene.grid().pixelTimes({points.count(), points.in[0].data(), points.in[1].data()}, times));
-    std::ranges::copy(points.out[9], points.in[0].begin());
-    std::ranges::copy(points.out[10], points.in[1].begin());
+    double *const first = points.in[0].data(), *const second = points.in[1].data();
+    require_solved(scene.grid().pixelTimes({points.count(), first, second}, {first, second}));
+    points.out[9] = points.in[0];
+    points.out[10] = points.in[1];
     to_ground(scene, own, points);
-    for (std::size_t i = 0; i < points.count(); ++i)
-        if (outside[i] != QUO_OK) points.status[i] = outside[i];
 }
 
 GeodeticPoint place_of(const Points& points, std::size_t i) {
