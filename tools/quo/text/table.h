@@ -104,12 +104,16 @@ public:
     std::string place() const;
     std::string place(std::int64_t line_number) const;
 
+    /** The same about the column names. */
+    std::string place_of_names() const { return place(names_at_); }
+
     const LineReader& input() const { return input_; }
 
 private:
     LineReader input_;
     std::vector<std::string> columns_, comments_;
     std::string line_;
+    std::int64_t names_at_ = 0;
     Row row_;
 };
 

@@ -204,10 +204,34 @@ void check_use(const GeolocateOptions& options) {
 
 /** A table to the ground has times, or where it has none lines and samples. */
 const Direction& direction_of(const GeolocateOptions& options, const Table& table) {
-    if (options.direction == "ground")
-        return !table.find(kAzimuthTime) && table.find("line") ? kPixelsToGround : kToGround;
+    if (options.direction == "ground") {
+        if (table.find(kAzimuthTime)) return kToGround;
+        if (table.find("line")) return kPixelsToGround;
+        throw Failure(table.place_of_names() +
+                      ": neither columns azimuth_time_s and range_time_s nor line and sample");
+    }
     if (options.pixels) return options.precise ? kToPixelsPrecisely : kToPixels;
     return options.precise ? kToRadarPrecisely : kToRadar;
+}
+
+/** Why a point may have no solution, and what to look at. */
+std::string advice(const Direction& direction, const Scene& scene, int status) {
+    switch (status) {
+        case QUO_NOT_SEEN:
+            return ": the state vectors reach from " + iso_or_number(scene.first_time()) + " to " +
+                   iso_or_number(scene.last_time()) +
+                   (direction.ground ? ""
+                    : direction.line_at < direction.outputs.size()
+                        ? ", and the Earth may hide the point, or no burst show it"
+                        : ", and the Earth may hide the point");
+        case QUO_NUMERIC:
+            return ": no ground is there at that Doppler; range_time_s is two-way, in seconds";
+        case QUO_REFUSED:
+            return direction.inputs.data() == kPixel ? ": the pixel is in no burst, or before the first range"
+                                                     : ": no such range or height can be";
+        default:
+            return "";
+    }
 }
 
 /** Where a direction finds its values in a row of the table. */
@@ -218,7 +242,8 @@ public:
         for (const Input& input : direction.inputs) indices_.push_back(table.need(input.name));
         if (direction.ground) height_ = table.find(kHeight.name);
         if (height_ && options.height_m)
-            throw Failure(table.input().name() + ": there is a column " + kHeight.name + ", and --height");
+            throw Failure(table.place_of_names() + ": there is a column " + kHeight.name +
+                          "; leave --height out, or rename the column");
         given_height_m_ = options.height_m.value_or(0.0);
     }
     bool has_doppler() const { return doppler_.has_value(); }
@@ -337,7 +362,8 @@ private:
             auto& cause = defects_[i];
             const int status = cause ? QUO_REFUSED : points_.status[i];
             append_row(text, line, number, cause.has_value());
-            if (!cause && status != 0) cause = "status " + status_text(status);
+            if (!cause && status != 0)
+                cause = "status " + status_text(status) + advice(*direction_, *scene_, status);
             append_values(i, status);
             if (status == 0 && !first_only_ && !std::isnan(points_.second_line[i])) {
                 append_row(text, line, number, false);
@@ -417,7 +443,7 @@ int geolocate_table(Scene& scene, const GeolocateOptions& options) {
     output.commit();
     if (unsolved == 0) return kFine;
     complain(table.input().name() + ": " + std::to_string(unsolved) + " of " + std::to_string(rows) +
-             " rows without a solution");
+             " rows without a solution; column status tells which");
     return kFindings;
 }
 
