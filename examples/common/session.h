@@ -6,8 +6,10 @@
 #include <cstdio>
 #include <exception>
 #include <filesystem>
+#include <fstream>
 #include <stdexcept>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "quo_base/ckerr.h"
@@ -34,6 +36,22 @@ inline void write_product(GeneralSAR& product, const std::string& header) {
     quorelxml::setExactNumbers(true);  // 15 digits would cost the azimuth times their last microsecond
     product.GSwrite(header.c_str());   // 0 whatever happens
     if (!std::filesystem::exists(header, failure)) throw Failure{header + ": cannot be written"};
+}
+
+/** Writes a file beside its name and puts it there in one step, so that an older one of that name stays whole
+ * until then; throws Failure. */
+inline void write_file(const std::string& name, std::string_view bytes) {
+    const std::string unfinished = name + ".part";
+    std::error_code failure, ignored;
+    std::ofstream stream{unfinished, std::ios::binary};
+    const bool created = stream.is_open();
+    stream << bytes;
+    stream.close();
+    const bool written = !stream.fail();
+    if (written) std::filesystem::rename(unfinished, name, failure);
+    if (created && (!written || failure)) std::filesystem::remove(unfinished, ignored);
+    errno = 0;  // what that left would count as an error of the next function of the library
+    if (!written || failure) throw Failure{name + ": cannot be written"};
 }
 
 /** The files that a program reads and those that it writes. */

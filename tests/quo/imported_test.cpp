@@ -1,6 +1,7 @@
 // What the tool makes of products of a mission, and of one with the lines of a map in it.
 #include <gtest/gtest.h>
 
+#include <array>
 #include <cmath>
 #include <complex>
 #include <cstdlib>
@@ -9,7 +10,7 @@
 #include <string>
 #include <vector>
 
-#include "quo_base/api.h"
+#include "quo_base/image_grid.h"
 #include "support/sentinel1.h"
 #include "tool.h"
 
@@ -118,6 +119,29 @@ TEST_P(Imported, HasControlPointsThatKeepHalfAPixel) {
     EXPECT_LE(most, 0.5);
     const auto last = vrt.rfind("<GCP Id=\"");
     EXPECT_LT(std::stoi(vrt.substr(last + 9)), 1000);
+}
+
+// The same image with every second of its samples: twice the step, in slant range or on the ground.
+TEST_P(Imported, CoregistersWithEverySecondSample) {
+    const std::string half = folder_.file("half.hdr"), whole = test::read_text(header()),
+                      narrow = "<NrOfPixelsPerLine>30<";
+    test::write_text(header(), test::replaced(whole, narrow, "<NrOfPixelsPerLine>20000<"));
+    test::write_text(half, test::replaced(whole, narrow, "<NrOfPixelsPerLine>10000<"));
+    ImageGrid_Obj grid;
+    ASSERT_EQ(grid.readhdr(half.c_str()), 0);
+    ASSERT_EQ(grid.cut(0.0, 0.0, 1.0, 2.0), 0);
+    ASSERT_EQ(grid.writehdr(half.c_str()), 0);
+    const auto run = test::quo({"coregister", header(), half, "-o", folder_.file("REGIST.xml"), "--json"});
+    ASSERT_EQ(run.exit_status, 0) << run.err;
+    const json found = json::parse(run.out);
+    EXPECT_GT(found["points"], 900);
+    const double sample = found["Rg_Samples_Origin"], line = found["Az_Samples_Origin"];
+    for (const auto& [form, expected] : {std::pair{"Rg_Fit_Coeff", std::array{0.0, 0.5, 0.0, 0.5 * sample}},
+                                         std::pair{"Az_Fit_Coeff", std::array{0.0, 0.0, 1.0, line}}}) {
+        constexpr double kFar[] = {1e8, 1e4, 1e4, 1.0};  // what the coefficients are multiplied with there
+        for (std::size_t i = 0; i < expected.size(); ++i)
+            EXPECT_NEAR(found[form][i].get<double>() * kFar[i], expected[i] * kFar[i], 2e-3) << form << i;
+    }
 }
 
 // ---- Items of a catalogue

@@ -147,9 +147,9 @@ Agreement check_scene(const std::string& header, const TiepointsOptions& options
     scene.require_look_side();
     scene.require_wavelength();
     Table table{options.points.empty() ? points_beside(header) : options.points};
-    const std::size_t columns[] = {table.need("azimuth_time_s"), table.need("range_time_s"),
-                                   table.need("latitude_deg"),   table.need("longitude_deg"),
-                                   table.need("height_m"),       table.need("incidence_deg")};
+    const std::size_t columns[] = {table.need(kAzimuthTime),   table.need("range_time_s"),
+                                   table.need("latitude_deg"), table.need("longitude_deg"),
+                                   table.need("height_m"),     table.need("incidence_deg")};
     Agreement agreement{
         .scene = scene_name(header), .vertical = vertical_of(table, options.incidence), .residuals = {}};
     std::vector<TiePoint> ties;
@@ -227,7 +227,7 @@ constexpr const char* kDetails =
     "Tie points are ground points whose azimuth time and range time are known. Azimuth time and slant range are\n"
     "found from the ground point, ground position and incidence angle from the times and the point's height.\n"
     "Reads azimuth_time_s, range_time_s, latitude_deg, longitude_deg, height_m and incidence_deg from\n"
-    "SCENE_tie_points.csv beside SCENE.xml.\n";
+    "SCENE_tie_points.csv beside SCENE.xml. Azimuth times may be dates.\n";
 
 }  // namespace
 
