@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <array>
+#include <charconv>
 #include <cstddef>
 #include <cstdint>
 #include <filesystem>
@@ -13,6 +14,7 @@
 #include <numeric>
 #include <random>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "orbit/made_orbits.h"
@@ -184,6 +186,21 @@ void read_values(State& state) {
 }
 BENCHMARK(read_values)->RangeMultiplier(10)->Range(1000, 1000000);
 
+/** The same without a document. */
+void pass_values(State& state) {
+    const std::string file = header_of_values(state.range(0));
+    const std::string path = std::string{kField} + "/val";
+    std::vector<double> values(static_cast<std::size_t>(state.range(0)));
+    while (state.KeepRunningBatch(state.range(0))) {
+        auto at = values.begin();
+        if (quorelxml::readTexts(file.c_str(), 1, path.c_str(), [&](std::string_view text) {
+                std::from_chars(text.data(), text.data() + text.size(), *at++);
+            }))
+            state.SkipWithError("failed");
+    }
+}
+BENCHMARK(pass_values)->RangeMultiplier(10)->Range(1000, 1000000);
+
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -205,5 +222,7 @@ int main(int argc, char** argv) {
             {"rewrite: 6000 / 600 polynomials", "rewrite_polynomials/6000", "rewrite_polynomials/600", 1.2},
             {"rewrite: 240000 / 600 polynomials", "rewrite_polynomials/240000", "rewrite_polynomials/600", 1.2},
             {"read: 1000000 / 10000 values", "read_values/1000000", "read_values/10000", 1.2},
+            {"pass: 1000000 / 10000 values", "pass_values/1000000", "pass_values/10000", 1.2},
+            {"pass / read: 1000000 values", "pass_values/1000000", "read_values/1000000", 1.2},
         });
 }
