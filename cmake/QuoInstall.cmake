@@ -1,5 +1,6 @@
-# What is installed, in three components: runtime (the library and its FFT engine), development (headers, CMake
-# package, pkg-config file), tools (the command-line tool, its manual pages and completion).
+# What is installed, in components: runtime (the library and its FFT engine), development (headers, CMake package,
+# pkg-config file), tools (the command-line tool, its manual pages and completion), python (the package for Debian's
+# Python) and, only where it is asked for, wheel (the same with the library inside).
 include(CMakePackageConfigHelpers)
 
 install(TARGETS quo_base EXPORT quo_base_targets
