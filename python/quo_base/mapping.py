@@ -162,7 +162,7 @@ def geocode(
 
     Amplitudes of complex images are interpolated, not the samples: their phase turns too fast for a neighbour's.
     """
-    _check(resampling, quantities)
+    _check(resampling, quantities, chunks)
     held = product if isinstance(product, Product) else Product(product)
     if held.path is None:
         raise ValueError("a product in memory has no raster to map")
@@ -172,7 +172,9 @@ def geocode(
     return _dataset(job, _eager(job) if chunks is None else _lazy(job, chunks))
 
 
-def _check(resampling: str, quantities: Sequence[str]) -> None:
+def _check(resampling: str, quantities: Sequence[str], chunks: Optional[int]) -> None:
+    if chunks is not None and chunks < 1:
+        raise ValueError(f"tiles of {chunks} pixels make no map")
     if resampling not in _maps.RESAMPLINGS:
         raise ValueError(f"resampling is one of {', '.join(_maps.RESAMPLINGS)}, not {resampling!r}")
     unknown = [name for name in quantities if name not in QUANTITIES]

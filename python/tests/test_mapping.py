@@ -93,7 +93,7 @@ def test_heights_of_a_geoid_are_converted_or_refused_and_never_mixed(product, fl
     with pytest.raises(ValueError, match="no place in common"):
         far = write_model(tmp_path / "far.tif", np.zeros((9, 9)), (150.0, 10.0), 1e-3)
         geocode(product, far, heights="ellipsoid")
-    for wrong in ({"resampling": "cubic"}, {"quantities": []}, {"quantities": ["height", "slope"]}, {"heights": "sea"}, {"spacing": -1.0}):
+    for wrong in ({"resampling": "cubic"}, {"quantities": []}, {"quantities": ["height", "slope"]}, {"heights": "sea"}, {"spacing": -1.0}, {"chunks": 0}):
         with pytest.raises(ValueError):
             geocode(product, flat, **{"heights": "ellipsoid", **wrong})
     with rasterio.open(flat, "r+") as file:
