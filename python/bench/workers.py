@@ -22,11 +22,13 @@ def peak_mib():
 def on_workers(count, first, doing):
     """Seconds of a run, after one that loads the modules; the processor's seconds of the busiest worker; and the
     workers' memory before and after, MiB."""
-    with LocalCluster(count, threads_per_worker=1, dashboard_address=None) as cluster, Client(cluster) as client:
+    with LocalCluster(count, threads_per_worker=1, dashboard_address=":0") as cluster, Client(cluster) as client:
         client.run(first)
         before, busy = max(client.run(peak_mib).values()), client.run(time.process_time)
         took = seconds(doing)
-        most = max(now - busy[worker] for worker, now in client.run(time.process_time).items())
+        spent = [now - busy[worker] for worker, now in client.run(time.process_time).items()]
+        print("processor's seconds of each worker:", *(f"{each:.2f}" for each in spent))
+        most = max(spent)
         return took, most, before, max(client.run(peak_mib).values())
 
 
