@@ -4,5 +4,5 @@ set -eu
 cd "$(dirname "$0")"
 scripts/install_deps.sh
 scripts/build.sh release quo_base quo_base_tiff quo example_complete_product make_measurement echo_simulator processor \
-    point_targets
+    point_targets quo_python
 exec scripts/demo_job.sh build/release

@@ -1,6 +1,7 @@
-# What is installed, in three components: runtime (the library, the modules that it loads, and the licence), development
+# What is installed, in components: runtime (the library, the modules that it loads, and the licence), development
 # (headers, CMake package, pkg-config file, documentation and examples), tools (the command-line tool, its manual pages
-# and completion).
+# and completion), python (the package for Debian's Python) and, only where it is asked for, wheel (the same with the
+# library inside).
 include(CMakePackageConfigHelpers)
 
 install(TARGETS quo_base EXPORT quo_base_targets

@@ -1,6 +1,6 @@
 # Run on the staged files before they are packed: what a Debian package holds beside the installed files.
 find_program(GZIP gzip REQUIRED)
-foreach(component IN ITEMS runtime development tools)
+foreach(component IN LISTS CPACK_COMPONENTS_ALL)
     string(TOUPPER ${component} upper)
     set(stage "${CPACK_TEMPORARY_DIRECTORY}/${component}/usr")
     set(folder "${stage}/share/doc/${CPACK_DEBIAN_${upper}_PACKAGE_NAME}")
@@ -23,5 +23,8 @@ foreach(component IN ITEMS runtime development tools)
     execute_process(COMMAND "${GZIP}" -9nf "${folder}/changelog" ${pages} COMMAND_ERROR_IS_FATAL ANY)
 endforeach()
 # The system's loader finds the library by itself; only copies elsewhere need to be told where it is.
-file(GLOB tool "${CPACK_TEMPORARY_DIRECTORY}/tools/usr/bin/quo")
-file(RPATH_REMOVE FILE "${tool}")
+file(GLOB placed "${CPACK_TEMPORARY_DIRECTORY}/tools/usr/bin/quo"
+    "${CPACK_TEMPORARY_DIRECTORY}/python/usr/lib/python3/dist-packages/quo_base/_core*.so")
+foreach(file IN LISTS placed)
+    file(RPATH_REMOVE FILE "${file}")
+endforeach()

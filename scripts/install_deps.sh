@@ -8,8 +8,8 @@ set -eu
 packages="git pkg-config ca-certificates g++ cmake ninja-build libxml2-dev libtrio-dev libcli11-dev
 nlohmann-json3-dev libpng-dev libcairo2-dev libtiff-dev libfftw3-dev libgtest-dev libgmock-dev libbenchmark-dev liblapack-dev libeigen3-dev
 clang-format clang-tidy dpkg-dev file lintian help2man doxygen gdal-bin pybind11-dev python3-dev python3-numpy
-python3-pytest python3-xarray python3-dask python3-distributed python3-rasterio python3-pyproj python3-pyflakes
-clang libclang-rt-dev valgrind time abigail-tools"
+python3-pytest python3-pip python3-matplotlib python3-xarray python3-dask python3-distributed python3-rasterio python3-pyproj
+python3-pyflakes clang libclang-rt-dev valgrind time abigail-tools"
 case "${1:-}" in
 "") ;;
 --with-mkl) packages="$packages libmkl-rt" ;;
