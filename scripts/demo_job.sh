@@ -18,3 +18,5 @@ scripts/demo_product.sh "$1"
 scripts/demo_import.sh "$1"
 scripts/demo_chain.sh "$1"
 scripts/demo_python.sh "$1"
+echo
+echo "To run quo from any folder: PATH=$PWD/$1/tools/quo:\$PATH"
