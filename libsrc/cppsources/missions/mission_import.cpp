@@ -96,9 +96,7 @@ private:
         const auto lines =
             static_cast<std::size_t>(std::min<std::int64_t>(measurement_.block_lines, measurement_.lines - first));
         const std::size_t samples = lines * static_cast<std::size_t>(measurement_.samples);
-        if (!widens()) {
-            return write(block_.data(), samples * bytes_of(measurement_.type));
-        }
+        if (!widens()) return write(block_.data(), samples * bytes_of(measurement_.type));
         const auto* const narrow = reinterpret_cast<const std::uint16_t*>(block_.data());
         std::copy_n(narrow, samples, wide_.begin());
         write(reinterpret_cast<const char*>(wide_.data()), samples * sizeof wide_[0]);

@@ -351,9 +351,8 @@ void set_polynomials(const Annotation& a, const ImageGrid_Obj& grid, GeneralSAR&
                    set.FR[i]);
     set_ground_polynomials(a, grid, set);
     const polyDC broadside{};
-    if (const int status =
-            product.orbit.SVGetSlantToAnglesPolys(&product.roi.Roi, &broadside, &set.SL2THETA[0], &set.SL2PHI[0]))
-        a.root.refuse("the orbit gives no incidence and look angles over the image", status);
+    if (product.orbit.SVGetSlantToAnglesPolys(&product.roi.Roi, &broadside, &set.SL2THETA[0], &set.SL2PHI[0]))
+        a.root.refuse("the orbit gives no incidence and look angles over the image");
     product.GSenable(gsPolySAR);
 }
 
