@@ -15,6 +15,7 @@
 #include "quo_base/ckerr.h"
 #include "quo_base/generalSAR.h"
 #include "quo_base/quorelReport.h"
+#include "same_file.h"
 
 namespace example {
 
@@ -61,13 +62,10 @@ struct Files {
 
 /** Throws where a file to be written is one that is read, by whatever name or link, or stands there twice: the
  * program would destroy what it needs. Names of no file yet are apart from all. */
-inline void require_apart(const Files& files) {
-    std::error_code error;
-    const auto same = [&](const std::string& a, const std::string& b) {
-        return a == b || (std::filesystem::is_regular_file(a, error) && std::filesystem::equivalent(a, b, error));
-    };
-    std::vector<std::string> others = files.read;
-    for (const std::string& name : files.written) {
+inline void require_apart(const Files& given) {
+    const auto same = [](const std::string& a, const std::string& b) { return a == b || files::same_file(a, b); };
+    std::vector<std::string> others = given.read;
+    for (const std::string& name : given.written) {
         if (std::ranges::any_of(others, [&](const std::string& other) { return same(name, other); }))
             throw Failure{name + ": would replace a file that the program needs"};
         others.push_back(name);
