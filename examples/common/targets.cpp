@@ -1,8 +1,8 @@
 #include "targets.h"
 
-#include <algorithm>
 #include <cerrno>
 #include <fstream>
+#include <map>
 #include <sstream>
 #include <utility>
 
@@ -31,7 +31,7 @@ std::vector<Target> read_targets(const std::string& file) {
     std::ifstream stream{file};
     if (!stream) throw Failure{file + ": cannot be read"};
     std::vector<Target> targets;
-    std::vector<int> lines;  // in which they stand
+    std::map<std::string, int> lines;  // in which the names stand
     bool names_passed = false;
     int number = 0;
     for (std::string line; std::getline(stream, line);) {
@@ -40,13 +40,11 @@ std::vector<Target> read_targets(const std::string& file) {
         if (std::exchange(names_passed, true)) {
             const std::string where = file + ": line " + std::to_string(number) + ": ";
             Target target = parse_target(line, where);
-            const auto same = std::ranges::find(targets, target.name, &Target::name);
-            if (same != targets.end())
+            const auto& [named, is_new] = lines.try_emplace(target.name, number);
+            if (!is_new)
                 throw Failure{where + target.name + " is the name of the target in line " +
-                              std::to_string(lines[static_cast<std::size_t>(same - targets.begin())]) +
-                              "; give each its own"};
+                              std::to_string(named->second) + "; give each its own"};
             targets.push_back(std::move(target));
-            lines.push_back(number);
         }
     }
     if (targets.empty()) throw Failure{file + ": no targets"};

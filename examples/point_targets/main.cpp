@@ -41,7 +41,8 @@ int main(int argc, char** argv) {
     app.takes("--target", options.portrayed, "Which target that is (the first)");
     if (const auto status = app.parse(argc, argv)) return *status;
     example::Files files{{options.image, options.image + ".hdr", options.targets}, {}};
-    if (!options.picture.empty()) files.written.push_back(options.picture);
+    if (!options.picture.empty())
+        files.written.insert(files.written.end(), {options.picture, example::unfinished_name(options.picture)});
     return example::run_program("Point targets", files, options.image + ".targets.report.txt", "", 1,
                                 [&] { measure(options); });
 }

@@ -180,7 +180,7 @@ Pixel pixel_of(const ImageGrid_Obj& grid, double azimuth_s, double range_s, cons
         grid.timePixels({1, &azimuth_s, &range_s}, {&pixel.line, &later_line, &pixel.sample, &status});
     require(refused != QUO_OK ? refused : status, name + " lies on no pixel");
     if (room_in_burst(grid, later_line) > room_in_burst(grid, pixel.line)) pixel.line = later_line;
-    if (room_in_burst(grid, pixel.line) < kChip / 2) throw Failure{name + " lies at the border of a burst"};
+    if (room_in_burst(grid, pixel.line) < 0.5 * kChip) throw Failure{name + " lies at the border of a burst"};
     return pixel;
 }
 

@@ -121,7 +121,8 @@ TEST(WriteFile, LeavesWhatItCannotReplace) {
     EXPECT_THROW(example::write_file(old, "new"), example::Failure);
     EXPECT_EQ(test::read_text(old), "old");
     std::filesystem::remove(old + ".part");
-    example::write_file(old, "new");
+    std::filesystem::create_symlink(old, taken + "/link");
+    example::write_file(taken + "/link", "new");
     EXPECT_EQ(test::read_text(old), "new");
 }
 

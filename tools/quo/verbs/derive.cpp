@@ -77,20 +77,16 @@ void doppler_of(const polySAR& set, const ROI_Obj& region, polyDC& dc) {
     dc.taz0 = set.DC[static_cast<std::size_t>(index)].taz0;
 }
 
-double number_of(const std::string& text) {
-    if (const auto number = finite_number(text)) return *number;
-    throw WrongUse("--region: \"" + text + "\" is no number");
-}
-
 ROI_Obj& region_of(const DeriveOptions& options, ROI_Obj& region) {
     if (options.region.empty()) {
         read_region(options.header, region);
         return region;
     }
-    region.FastStartTime = number_of(options.region[0]);
-    region.FastTimeLength = number_of(options.region[1]);
+    constexpr const char* kOption = "--region";
+    region.FastStartTime = finite_number(options.region[0], kOption);
+    region.FastTimeLength = finite_number(options.region[1], kOption);
     region.SlowStartTime = seconds_of(options.region[2]);
-    region.SlowTimeLength = number_of(options.region[3]);
+    region.SlowTimeLength = finite_number(options.region[3], kOption);
     const bool positive = region.FastStartTime > 0.0 && region.FastTimeLength > 0.0 && region.SlowTimeLength > 0.0;
     if (!positive || !std::isfinite(region.GetDownRight().FastTime + region.GetDownRight().SlowTime))
         throw WrongUse("a region needs a range start and lengths above 0");

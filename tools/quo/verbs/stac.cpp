@@ -1,4 +1,3 @@
-#include <charconv>
 #include <cmath>
 #include <filesystem>
 #include <nlohmann/json.hpp>
@@ -116,9 +115,7 @@ private:
         add_number("sat:relative_orbit", info.Track);
     }
     void add_number(const char* key, const std::string& text) {
-        int number = 0;
-        const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
-        if (error == std::errc{} && end == text.data() + text.size() && number > 0) properties_[key] = number;
+        if (const auto number = whole_number(text); number && *number > 0) properties_[key] = *number;
     }
 
     void add_pixels() {
