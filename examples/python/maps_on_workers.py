@@ -33,7 +33,7 @@ def main():
     told = arguments.parse_args()
     names = [os.path.join(told.folder, os.path.basename(header)[:-4] + ".tif") for header in told.headers]
     jobs = [Job(name, make_map, (header, told.dem)) for name, header in zip(names, told.headers)]
-    cluster = told.scheduler or LocalCluster(2, threads_per_worker=1, dashboard_address=None)
+    cluster = told.scheduler or LocalCluster(n_workers=2, threads_per_worker=1, dashboard_address=None)
     with Client(cluster) as client:
         outcomes = run(jobs, client)
     for outcome in outcomes:

@@ -12,7 +12,7 @@ from distributed import Client, LocalCluster
 from quo_base import geocode
 from scene import make_product, make_terrain, seconds
 
-LINES, SAMPLES, PIXELS, TILE = 4000, 4000, 1024, 128
+LINES, SAMPLES, PIXELS, TILE = 4000, 4000, 768, 128
 
 
 def peak_mib():
@@ -22,7 +22,7 @@ def peak_mib():
 def on_workers(count, first, doing):
     """Seconds of a run, after one that loads the modules; the processor's seconds of the busiest worker; and the
     workers' memory before and after, MiB."""
-    with LocalCluster(count, threads_per_worker=1, dashboard_address=":0") as cluster, Client(cluster) as client:
+    with LocalCluster(n_workers=count, threads_per_worker=1, dashboard_address=":0") as cluster, Client(cluster) as client:
         client.run(first)
         before, busy = max(client.run(peak_mib).values()), client.run(time.process_time)
         took = seconds(doing)

@@ -3,6 +3,7 @@
 from __future__ import annotations
 
 import os
+from importlib.util import find_spec
 from typing import Any, NamedTuple, Optional, Sequence, Union
 
 import numpy as np
@@ -162,6 +163,7 @@ def geocode(
 
     Amplitudes of complex images are interpolated, not the samples: their phase turns too fast for a neighbour's.
     """
+    _need("xarray", "rasterio", "pyproj", *(["dask"] if chunks is not None else []))
     _check(resampling, quantities, chunks)
     held = product if isinstance(product, Product) else Product(product)
     if held.path is None:
@@ -170,6 +172,12 @@ def geocode(
     grid = MapGrid.over(held, terrain, crs, spacing)
     job = _Job(held.path, held.raster.path, terrain, grid, resampling, tuple(quantities))
     return _dataset(job, _eager(job) if chunks is None else _lazy(job, chunks))
+
+
+def _need(*modules: str) -> None:
+    for module in modules:
+        if find_spec(module) is None:
+            raise ModuleNotFoundError(f"geocode() needs {module}, Debian's python3-{module}", name=module)
 
 
 def _check(resampling: str, quantities: Sequence[str], chunks: Optional[int]) -> None:

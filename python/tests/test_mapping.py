@@ -3,6 +3,7 @@
 import os
 import pickle
 import re
+import sys
 import tracemalloc
 
 import numpy as np
@@ -96,6 +97,9 @@ def test_heights_of_a_geoid_are_converted_or_refused_and_never_mixed(product, fl
     for wrong in ({"resampling": "cubic"}, {"quantities": []}, {"quantities": ["height", "slope"]}, {"heights": "sea"}, {"spacing": -1.0}, {"chunks": 0}):
         with pytest.raises(ValueError):
             geocode(product, flat, **{"heights": "ellipsoid", **wrong})
+    with pytest.MonkeyPatch.context() as absent, pytest.raises(ModuleNotFoundError, match="python3-pyproj"):
+        absent.setitem(sys.modules, "pyproj", None)
+        geocode(product, flat, heights="ellipsoid")
     with rasterio.open(flat, "r+") as file:
         file.transform = rasterio.Affine(1e-4, 2e-5, file.transform.c, 2e-5, -1e-4, file.transform.f)
     with pytest.raises(ValueError, match="along the axes"):
@@ -184,7 +188,7 @@ def test_a_killed_worker_leaves_nothing_half(tmp_path, product, flat):
     jobs = [Job(str(tmp_path / str(i)), _write, (str(i),)) for i in range(6)]
     jobs.append(Job(str(tmp_path / "killed"), _kill_once, (str(tmp_path / "mark"),)))
     whole = geocode(product, flat, heights="ellipsoid").image.values
-    with distributed.LocalCluster(2, threads_per_worker=1, dashboard_address=None) as cluster:
+    with distributed.LocalCluster(n_workers=2, threads_per_worker=1, dashboard_address=None) as cluster:
         with distributed.Client(cluster) as client:
             assert all(outcome.state != "failed" for outcome in run(jobs, client, progress=None))
             tiles = geocode(product, flat, heights="ellipsoid", chunks=100).image.compute()
