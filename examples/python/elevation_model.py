@@ -17,7 +17,8 @@ def read_places(path):
     """Latitudes, longitudes (degrees) and heights (m) by name."""
     with open(path, newline="") as file:
         rows = csv.DictReader(line for line in file if not line.startswith("#"))
-        return {row["name"]: tuple(float(row[name]) for name in ("latitude_deg", "longitude_deg", "height_m")) for row in rows}
+        columns = ("latitude_deg", "longitude_deg", "height_m")
+        return {row["name"]: tuple(float(row[column]) for column in columns) for row in rows}
 
 
 def heights_around(places, latitude, longitude):
@@ -37,8 +38,9 @@ def main(places_file, path):
     rows, columns = (int((to - start) / STEP_DEG) for start, to in ((south, north), (west, east)))
     latitude = north - STEP_DEG * (np.arange(rows)[:, np.newaxis] + 0.5)
     longitude = west + STEP_DEG * (np.arange(columns) + 0.5)
-    shape = {"driver": "GTiff", "height": rows, "width": columns, "count": 1, "dtype": "float32", "crs": "EPSG:4326"}
-    with rasterio.open(path, "w", transform=rasterio.transform.from_origin(west, north, STEP_DEG, STEP_DEG), **shape) as file:
+    shape = {"height": rows, "width": columns, "count": 1, "dtype": "float32"}
+    place = {"crs": "EPSG:4326", "transform": rasterio.transform.from_origin(west, north, STEP_DEG, STEP_DEG)}
+    with rasterio.open(path, "w", driver="GTiff", **shape, **place) as file:
         file.write(heights_around(places, latitude, longitude).astype(np.float32), 1)
 
 

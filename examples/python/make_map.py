@@ -1,4 +1,4 @@
-"""A picture of an image on the map, and maps of the surroundings of known places, which should be bright in the middle.
+"""A picture of an image on the map, and of the surroundings of known places, which should be bright in the middle.
 
 The elevation model's heights are above the ellipsoid. Places are a list with the columns name, latitude_deg,
 longitude_deg and height_m.
@@ -59,7 +59,8 @@ def main(header, dem, places_file, picture):
     to_map = Transformer.from_crs("EPSG:4326", UTM, always_xy=True)
     places = {name: to_map.transform(longitude, latitude) for name, (latitude, longitude, _) in names.items()}
     whole = geocode(header, dem, UTM, COARSE_M, heights="ellipsoid").image
-    fine = geocode(header, dem, UTM, FINE_M, "sinc", heights="ellipsoid", chunks=128).image  # tiles made where asked for
+    # Tiles are made where they are asked for.
+    fine = geocode(header, dem, UTM, FINE_M, "sinc", heights="ellipsoid", chunks=128).image
     figure = pyplot.figure(figsize=(13, 6.5), layout="constrained")
     left, right = figure.subfigures(1, 2)
     draw_map(left.subplots(), whole, places)

@@ -1,4 +1,4 @@
-"""Array calls, raster slices and the import beside the same without the package: ratios and what they should be at most.
+"""Array calls, raster slices and the import beside the same without the package, as ratios.
 
 The calls of the library are made by ctypes, on the same arrays, in this process.
 
@@ -48,8 +48,8 @@ class Handle:
 
     def read(self, lines, samples):
         block = np.empty((lines, samples), np.complex64)
-        room = ctypes.c_size_t(block.nbytes)
-        self._check("read", self._library.quo_product_read(self._product, 0, lines, 0, samples, 0, pointer(block), room))
+        place = (0, lines, 0, samples, 0, pointer(block), ctypes.c_size_t(block.nbytes))
+        self._check("read", self._library.quo_product_read(self._product, *place))
 
 
 def beside(name, limit, package, library, times=7):
@@ -74,7 +74,8 @@ def main(library):
         rng = np.random.default_rng(5)
         azimuth, slant = 1167930362.0 + 8 * rng.random(POINTS), 0.0055 + 6e-5 * rng.random(POINTS)
         ground = orbit.to_ground(azimuth, slant)[:3]
-        beside("to_ground, 10^6 points", 1.1, lambda: orbit.to_ground(azimuth, slant), lambda: handle.to_ground(azimuth, slant))
+        seen = (azimuth, slant)
+        beside("to_ground, 10^6 points", 1.1, lambda: orbit.to_ground(*seen), lambda: handle.to_ground(*seen))
         beside("to_radar, 10^6 points", 1.1, lambda: orbit.to_radar(*ground), lambda: handle.to_radar(*ground))
         beside("all of a raster", 1.2, lambda: raster[:, :], lambda: handle.read(LINES, SAMPLES))
         beside("256 lines of a raster", 1.2, lambda: raster[:256], lambda: handle.read(256, SAMPLES))

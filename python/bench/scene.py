@@ -4,7 +4,7 @@ import time
 from pathlib import Path
 
 import numpy as np
-from quo_base import Product, RasterWriter
+from quo_base import Product, RasterWriter, Region
 
 SCENE = Path(__file__).parents[2] / "tests" / "data" / "scenes" / "s1a_iw1_slc_20220104_asc.xml"
 LINE_S, SAMPLE_S = 2.0555e-3, 1.5541e-8
@@ -18,9 +18,7 @@ def make_product(folder, lines, samples):
             image[line] = np.exp(0.1j * np.arange(samples) * line)
     product = Product(SCENE)
     product.add("RasterInfo", **Product(f"{path}.hdr").RasterInfo)
-    region = {"SlowStartTime": 1167930362.0, "SlowTimeDelta": LINE_S, "Lines": lines, "SlowTimeLength": LINE_S * lines}
-    region |= {"FastStartTime": 0.0055, "FastTimeDelta": SAMPLE_S, "Samples": samples, "FastTimeLength": SAMPLE_S * samples}
-    product.add("ROI", **region)
+    product.add("ROI", **Region.of_axes((0.0055, SAMPLE_S, samples), (1167930362.0, LINE_S, lines)))
     product.save(f"{path}.hdr", exact=True)
     return f"{path}.hdr"
 
@@ -36,8 +34,9 @@ def make_terrain(folder, header, pixels):
     corner = (float(middle.longitude) - step * pixels / 2, float(middle.latitude) + step * pixels / 2)
     heights = 50 * np.sin(np.arange(pixels) / 40)[:, np.newaxis] * np.cos(np.arange(pixels) / 50)
     path = str(Path(folder) / "dem.tif")
-    shape = {"driver": "GTiff", "height": pixels, "width": pixels, "count": 1, "dtype": "float32", "crs": "EPSG:4326"}
-    with rasterio.open(path, "w", transform=rasterio.transform.from_origin(*corner, step, step), **shape) as file:
+    shape = {"height": pixels, "width": pixels, "count": 1, "dtype": "float32"}
+    place = {"crs": "EPSG:4326", "transform": rasterio.transform.from_origin(*corner, step, step)}
+    with rasterio.open(path, "w", driver="GTiff", **shape, **place) as file:
         file.write(heights.astype(np.float32), 1)
     return path
 

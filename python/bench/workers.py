@@ -22,7 +22,8 @@ def peak_mib():
 def on_workers(count, first, doing):
     """Seconds of a run, after one that loads the modules; the processor's seconds of the busiest worker; and the
     workers' memory before and after, MiB."""
-    with LocalCluster(n_workers=count, threads_per_worker=1, dashboard_address=":0") as cluster, Client(cluster) as client:
+    alone = {"threads_per_worker": 1, "dashboard_address": ":0"}
+    with LocalCluster(n_workers=count, **alone) as cluster, Client(cluster) as client:
         client.run(first)
         before, busy = max(client.run(peak_mib).values()), client.run(time.process_time)
         took = seconds(doing)
@@ -50,16 +51,17 @@ def main():
         for workers in (1, 2):
             took, most, before, after = on_workers(workers, first, lambda: whole.mean().compute())
             one = one or (took, most)
-            print(f"{workers} worker(s): {count} tiles of {TILE} x {TILE} in {took:.2f} s, {one[0] / took:.2f} times as fast as one;"
-                  f" processor's time of the busiest {most:.2f} s, one: {one[1] / most:.2f} times;"
+            print(f"{workers} worker(s): {count} tiles of {TILE} x {TILE} in {took:.2f} s,"
+                  f" {one[0] / took:.2f} times as fast as one; processor's time of the busiest {most:.2f} s, one: {one[1] / most:.2f} times;"
                   f" {before:.0f} MiB before, {after:.0f} MiB after", flush=True)
         start = time.process_time()
         small.compute(scheduler="synchronous")
         inside = time.process_time() - start
         _, on_one, _, _ = on_workers(1, first, lambda: small.compute())
-        print(f"a tile of 16 x 16, bilinear, processor's time: {1e3 * inside / 256:.2f} ms; on a worker {1e3 * on_one / 256:.2f} ms")
-        graph = len(pickle.dumps(whole.data.dask))
-        print(f"a plan of {count} tiles: {graph} bytes; of {tiles(16).data.npartitions}: {len(pickle.dumps(tiles(16).data.dask))}")
+        print(f"a tile of 16 x 16, bilinear, processor's time: {1e3 * inside / 256:.2f} ms;"
+              f" on a worker {1e3 * on_one / 256:.2f} ms")
+        for plan in (whole.data, tiles(16).data):
+            print(f"a plan of {plan.npartitions} tiles: {len(pickle.dumps(plan.dask))} bytes")
 
 
 if __name__ == "__main__":

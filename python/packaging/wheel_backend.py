@@ -1,7 +1,7 @@
 """Makes the wheel of the package, with the library and its modules inside, for `pip install ./python`.
 
-The library is built in build/wheel beside the sources. `pip install --config-settings folder=BUILD` packs what was built
-elsewhere.
+The library is built in build/wheel beside the sources. `pip install --config-settings folder=BUILD` packs what was
+built elsewhere.
 """
 
 import base64
@@ -22,7 +22,8 @@ def _built():
     without = [f"-DQUO_BUILD_{part}=OFF" for part in ("TESTS", "BENCH", "TOOLS")]
     options = ["-DCMAKE_BUILD_TYPE=Release", "-DQUO_PYTHON=ON", f"-DPython_EXECUTABLE={sys.executable}", *without]
     subprocess.run(["cmake", "-S", SOURCES, "-B", folder, "-G", "Ninja", *options], check=True)
-    subprocess.run(["cmake", "--build", folder, "--target", "quo_python", "quo_base_fftw", "quo_base_tiff"], check=True)
+    targets = ["quo_python", "quo_base_fftw", "quo_base_tiff"]
+    subprocess.run(["cmake", "--build", folder, "--target", *targets], check=True)
     return folder
 
 
