@@ -5,8 +5,9 @@
 add_library(quo_flags INTERFACE)
 target_compile_options(quo_flags INTERFACE
     -Wall -Wextra -Wpedantic -Wconversion -Wshadow -Wformat=2
-    # Of which clang's counts every int that indexes a container of the standard library.
-    $<$<CXX_COMPILER_ID:Clang>:-Wno-sign-conversion>
+    # Of which clang's counts every int that indexes a container of the standard library, and every pair of braces that
+    # the language lets out.
+    $<$<CXX_COMPILER_ID:Clang>:-Wno-sign-conversion -Wno-missing-braces>
     -fno-semantic-interposition
     # Results must not hang on which operations the compiler chose to fuse.
     -ffp-contract=off)
@@ -25,6 +26,8 @@ if(QUO_SANITIZE)
     list(APPEND quo_sanitize -fno-sanitize-recover=all -fno-omit-frame-pointer)
     target_compile_options(quo_flags INTERFACE ${quo_sanitize} -O1 -g1)
     target_link_options(quo_flags INTERFACE ${quo_sanitize})
+    # Programs in C call what is written in C++, whose checks need its part of the sanitizers.
+    set(CMAKE_C_LINK_EXECUTABLE "${CMAKE_CXX_LINK_EXECUTABLE}")
 endif()
 # What a target says of itself would stand before the options above, and lose; said in both places, it would be taken
 # for a repetition and left out here.

@@ -161,7 +161,9 @@ TEST_P(EveryObject, RegistersTheListedFields) {
     }
     if (!record) return;
     const auto made = GeneralSAR_ConfigurationRecord::make(subject_.name);
-    EXPECT_TRUE(made && typeid(*made) == typeid(*record));
+    ASSERT_TRUE(made);
+    const GeneralSAR_ConfigurationRecord &one = *made, &other = *record;
+    EXPECT_TRUE(typeid(one) == typeid(other));
     EXPECT_EQ(record->section() + std::string{record->meaning(-1)} + record->unit(1000), subject_.name);
 }
 

@@ -26,11 +26,9 @@ TEST(PlaceTree, FindsTheNearestOfAll) {
             for (std::int32_t run = 0; run < count; ++run)
                 places.push_back({{number(size.x), number(size.y), number(size.z)}, run});
             if (size.x == 2.0)
-                for (Vec3& at : places | std::views::transform(&OrbitPlace::at))
-                    at = {std::round(at.x), std::round(at.y), std::round(at.z)};
+                for (auto& [at, run, least] : places) at = {std::round(at.x), std::round(at.y), std::round(at.z)};
             if (size.x == 1.0)
-                for (Vec3& at : places | std::views::transform(&OrbitPlace::at))
-                    at = (7e6 + number(7e5)) / norm(at) * at;
+                for (auto& [at, run, least] : places) at = (7e6 + number(7e5)) / norm(at) * at;
             const std::vector<OrbitPlace> in_order = places;
             quo::plant_tree(places);
             // All that a search from within leaves out it leaves out for this radius: no larger, and hardly

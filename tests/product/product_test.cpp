@@ -390,7 +390,8 @@ TEST(Product, RefusesWithNothingWrittenAndAnEntry) {
     for (const GSObject object : {gsDataSetInfo, gsSamplingConstants}) made.GSdisable(object);
     made.GSwrite(report.file("bare.xml").c_str());
     const Product whole = open_product(scene, raster.c_str()), bare = open_product(report.file("bare.xml"));
-    quo_product* const closed = open_product(scene).get();
+    quo_product* closed = nullptr;
+    closed = open_product(scene).get();
     errno = 0;
 
     Outputs outputs, before;
