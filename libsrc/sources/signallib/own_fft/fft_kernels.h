@@ -48,9 +48,8 @@ struct LaneFft {
 /** A transform along a row: its lanes are neighbours in step 1, results that are neighbours in step 2. */
 struct RowFft {
     LaneFft first, second;
-    const float* turns = nullptr;    ///< of step 1, a slot for each result of each pack of lanes
-    const FftRoot* packs = nullptr;  ///< long rows: what a pack's turns are multiplied by; `turns` holds one pack
-    std::ptrdiff_t pitch = 0;        ///< slots from one pack to the next
+    const float* turns = nullptr;  ///< of step 1, a slot for each result of each pack of lanes
+    std::ptrdiff_t pitch = 0;      ///< floats from one result of step 1 to the next
     std::ptrdiff_t tile = 0, lanes = 0;
 };
 
@@ -75,7 +74,7 @@ struct FftKernels {
     int width;  ///< lanes
     void (*columns)(const LaneFft& fft, const FftColumns& columns, float* room) noexcept;
     void (*rows)(const RowFft& fft, const FftRows& rows, float* room) noexcept;
-    /** Short rows, as many at a time as there are lanes. */
+    /** Short rows, as many at a time as there are lanes. Null where fewer lanes are as fast. */
     void (*short_rows)(const LaneFft& fft, const FftRows& rows, float* room) noexcept;
 };
 
