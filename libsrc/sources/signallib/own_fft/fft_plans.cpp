@@ -177,8 +177,8 @@ FftKind choose_fft(const FftGeometry& geometry, int widest) {
 }
 
 std::size_t fft_bytes(const FftKind& kind) noexcept {
-    // At most two buffers, a stage, a tile of some packs and the roots; of long rows the tile alone is of their
-    // size.
+    // At most two buffers, a stage, a tile of some packs and the roots; of rows the turns and the tile alone are of
+    // their size.
     const auto samples = static_cast<std::size_t>(kind.length) * 2 * sizeof(float);
     const auto lanes = static_cast<std::size_t>(kind.lanes);
     const std::size_t copies = kind.way != FftWay::Rows ? 4 * lanes + 1 : 4;

@@ -179,15 +179,20 @@ struct LaneFfts {
     // --- Passes
     // --------------------------------------------------------------------------------------------------
 
+    /** What results are turned by, if anything: all lanes by one root, or each by its own, from slots `lanes_step`
+     * apart. */
+    struct Outer {
+        const FftRoot* roots = nullptr;
+        const float* lanes = nullptr;
+        std::ptrdiff_t lanes_step = kSlot;
+    };
     /** A pass from slots `in_step` apart to slots `out_step` apart. `zero` takes result 0. */
     struct Route {
         const float* in;
         float *out, *zero;
-        std::ptrdiff_t in_step, out_step;
-        const FftRoot* outer;
-        const float* lanes;  ///< a slot for each result
-        std::ptrdiff_t lanes_step;
-        float sign;  ///< of imaginary parts that become lanes or come from them
+        std::ptrdiff_t in_step, out_step = kSlot;
+        Outer outer{};
+        float sign = 1.0F;  ///< of imaginary parts that become lanes or come from them
     };
     enum Turns { kNone, kInner, kOuter, kLanes };
 
@@ -195,8 +200,8 @@ struct LaneFfts {
     static void pass(const FftPass& pass, const Route& route) {
         const std::ptrdiff_t in_hop = pass.count * pass.stride * route.in_step;
         const std::ptrdiff_t out_hop = pass.stride * route.out_step;
-        const std::ptrdiff_t lanes_hop = pass.stride * route.lanes_step;
-        const FftRoot* roots = T == kOuter ? route.outer : pass.roots;
+        const std::ptrdiff_t lanes_step = route.outer.lanes_step, lanes_hop = pass.stride * lanes_step;
+        const FftRoot* roots = T == kOuter ? route.outer.roots : pass.roots;
         for (int p = 0; p < pass.count; ++p) {
             const float* from = route.in + std::ptrdiff_t{p} * pass.stride * route.in_step;
             float* to = route.out + std::ptrdiff_t{p} * R * out_hop;
@@ -210,7 +215,7 @@ struct LaneFfts {
                     each<R>([&](auto k) QUO_FFT_HERE { x[k] = turn(x[k], roots[q + k * pass.stride]); });
                 if constexpr (T == kLanes)
                     each<R>([&](auto k) QUO_FFT_HERE {
-                        x[k] = turn(x[k], load<false>(route.lanes + q * route.lanes_step + k * lanes_hop));
+                        x[k] = turn(x[k], load<false>(route.outer.lanes + q * lanes_step + k * lanes_hop));
                     });
                 save<OutInterleaved>(x[0], T != kInner && q == 0 ? route.zero : to);
                 each<R - 1>([&](auto k) QUO_FFT_HERE { save<OutInterleaved>(x[k + 1], to + (k + 1) * out_hop); });
@@ -222,19 +227,16 @@ struct LaneFfts {
     using PassKernel = void (*)(const FftPass&, const Route&);
     using Radices = std::integer_sequence<int, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 12, 14, 15, 16>;
     static constexpr int kRadices = 17;
-    struct PassTable {
-        PassKernel of[kRadices];
-    };
     template <bool InInterleaved, bool OutInterleaved, Turns T, int... R>
-    static constexpr PassTable passes_of(std::integer_sequence<int, R...> /*radices*/) {
-        PassTable table{};
-        ((table.of[R] = pass<R, InInterleaved, OutInterleaved, T>), ...);
+    static constexpr std::array<PassKernel, kRadices> passes_of(std::integer_sequence<int, R...> /*radices*/) {
+        std::array<PassKernel, kRadices> table{};
+        ((table[R] = pass<R, InInterleaved, OutInterleaved, T>), ...);
         return table;
     }
     template <bool InInterleaved, bool OutInterleaved, Turns T>
     static PassKernel find(int radix) {
-        static constexpr PassTable kTable = passes_of<InInterleaved, OutInterleaved, T>(Radices{});
-        return kTable.of[radix];
+        static constexpr auto kTable = passes_of<InInterleaved, OutInterleaved, T>(Radices{});
+        return kTable[static_cast<std::size_t>(radix)];
     }
 
     /** Where the slots of a transform stand: as they are, interleaved, or one lane a row of samples, each `step`
@@ -245,13 +247,6 @@ struct LaneFfts {
         Float* at;
         std::ptrdiff_t step;
         Form form;
-    };
-    /** What the results are turned by, if anything: all lanes by one root, or each by its own, from slots
-     * `lanes_step` apart. */
-    struct Outer {
-        const FftRoot* roots = nullptr;
-        const float* lanes = nullptr;
-        std::ptrdiff_t lanes_step = kSlot;
     };
     using From = Slots<const float>;
     using To = Slots<float>;
@@ -272,15 +267,15 @@ struct LaneFfts {
      * order, or the conjugate ones of conjugate rows. */
     static void run(const ShortFft& fft, From in, To out, Outer outer, float* work) {
         const int last = fft.passes - 1;
-        Route route{in.at, work, work, in.step, kSlot, outer.roots, outer.lanes, outer.lanes_step, 1.0F};
+        Route route{in.at, work, work, in.step, kSlot, outer};
         const bool conjugate = fft.backward && out.form == kAcross;
         if (conjugate) route.sign = -1.0F;
         for (int k = 0; k < last; ++k) {
-            const FftPass& pass = fft.pass[k];
-            first_pass(pass.radix, k == 0 ? in.form : kSplit)(pass, route);
+            float* const next = route.out == work ? work + fft.length * kSlot : work;
+            first_pass(fft.pass[k].radix, k == 0 ? in.form : kSplit)(fft.pass[k], route);
             route.in = route.out;
             route.in_step = kSlot;
-            route.out = route.out == work ? work + fft.length * kSlot : work;
+            route.out = next;
         }
         route.out = route.zero = out.at;
         route.out_step = out.step;
@@ -297,9 +292,10 @@ struct LaneFfts {
     /** Rows of an image: too far apart for the processor to see them coming, so that they are asked for early.
      * More of them, a power of two apart, would push each other out of the first caches. */
     static constexpr int kAhead = 6;
+    template <int Nearness = 3>
     QUO_FFT_INLINE void ask(const float* row, std::ptrdiff_t floats) {
         constexpr std::ptrdiff_t kLine = 16;
-        for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(row + k);
+        for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(row + k, 0, Nearness);
     }
     /** The first ones, while there is other work. */
     static void ask_first(const float* row, std::ptrdiff_t step, int rows, std::ptrdiff_t floats) {
@@ -425,41 +421,42 @@ struct LaneFfts {
     /** First of a pack's lanes: the last pack overlaps the one before it. */
     QUO_FFT_INLINE int lane_of(int pack, int count) { return (pack + 1) * W <= count ? pack * W : count - W; }
 
-    /** Into the second cache: asked for at once, the next row comes while this one is transformed. */
-    static void ask_row(const float* row, std::ptrdiff_t samples) {
-        constexpr std::ptrdiff_t kMost = 1 << 14, kLine = 16;
-        for (std::ptrdiff_t k = 0; k < 2 * (samples < kMost ? samples : kMost); k += kLine)
-            __builtin_prefetch(row + k, 0, 2);
+    /** Step 1: what it leaves is a row of the tile for each of its results. */
+    static void across_samples(const RowFft& fft, const float* in, float* tile, float* room) {
+        const int n1 = fft.second.length(), n2 = fft.first.length();
+        for (int b = 0; b * W < n1; ++b) {
+            const std::ptrdiff_t first = 2 * lane_of(b, n1);
+            one_pack(fft.first, {in + first, 2 * std::ptrdiff_t{n1}, kInterleaved},
+                     {tile + first, fft.pitch, kInterleaved}, fft.turns + std::ptrdiff_t{b} * n2 * kSlot, room);
+        }
+    }
+    /** Step 2: W rows of the tile are the lanes. */
+    static void across_results(const RowFft& fft, const float* tile, float* out, float* room) {
+        const int n1 = fft.second.length(), n2 = fft.first.length();
+        const std::ptrdiff_t step = 2 * std::ptrdiff_t{n2};
+        if (!fft.second.two_steps() && fft.second.first.passes == 1)
+            return run(fft.second.first, {tile, fft.pitch, kAcross}, {out, step, kInterleaved}, {}, room);
+        float *const lanes = room, *const rest = room + fft.lanes;
+        for (int c = 0; c * W < n2; ++c) {
+            const int result = lane_of(c, n2);
+            From from{tile + result * fft.pitch, fft.pitch, kAcross};
+            if (fft.second.two_steps()) {
+                row_kernels(1).in({1, n1, 1, nullptr}, {from.at, lanes, lanes, from.step});
+                from = {lanes, kSlot, kSplit};
+            }
+            one_pack(fft.second, from, {out + 2 * result, step, kInterleaved}, nullptr, rest);
+        }
     }
     static void rows(const RowFft& fft, const FftRows& rows, float* room) noexcept {
-        const int n1 = fft.second.length(), n2 = fft.first.length();
-        float *const tile = room, *const lanes = tile + fft.tile, *const rest = lanes + fft.lanes;
+        constexpr std::ptrdiff_t kMostAsked = 1 << 15;
+        const std::ptrdiff_t floats = 2 * std::ptrdiff_t{fft.first.length()} * fft.second.length();
+        float* const rest = room + fft.tile;
         for (std::ptrdiff_t row = 0; row < rows.count; ++row) {
             const float* const in = rows.in + row * rows.distance;
-            float* const out = rows.out + row * rows.distance;
-            if (row + 1 < rows.count) ask_row(in + rows.distance, std::ptrdiff_t{n1} * n2);
-            for (int b = 0; b * W < n1; ++b) {
-                const std::ptrdiff_t first = 2 * lane_of(b, n1);
-                one_pack(fft.first, {in + first, 2 * std::ptrdiff_t{n1}, kInterleaved},
-                         {tile + first, fft.pitch, kInterleaved}, fft.turns + std::ptrdiff_t{b} * n2 * kSlot,
-                         rest);
-            }
-            if (!fft.second.two_steps() && fft.second.first.passes == 1) {
-                run(fft.second.first, {tile, fft.pitch, kAcross}, {out, 2 * std::ptrdiff_t{n2}, kInterleaved}, {},
-                    rest);
-                continue;
-            }
-            for (int c = 0; c * W < n2; ++c) {
-                const int result = lane_of(c, n2);
-                From from{tile + result * fft.pitch, fft.pitch, kAcross};
-                if (fft.second.two_steps()) {
-                    row_kernels(1).in({1, n1, 1, nullptr},
-                                      {from.at, lanes, lanes, from.step, kSlot, nullptr, nullptr, 0, 1.0F});
-                    from = {lanes, kSlot, kSplit};
-                }
-                one_pack(fft.second, from, {out + 2 * result, 2 * std::ptrdiff_t{n2}, kInterleaved}, nullptr,
-                         rest);
-            }
+            // Into the second cache: asked for at once, the next row comes while this one is transformed.
+            if (row + 1 < rows.count) ask<2>(in + rows.distance, floats < kMostAsked ? floats : kMostAsked);
+            across_samples(fft, in, room, rest);
+            across_results(fft, room, rows.out + row * rows.distance, rest);
         }
     }
 
@@ -486,6 +483,14 @@ struct LaneFfts {
     /** First of two neighbours: at an odd end the last two overlap those before. */
     static constexpr int pair_of(int i, int count) { return i + 2 > count ? count - 2 : i; }
 
+    /** W rows. */
+    template <int N>
+    QUO_FFT_INLINE void load_rows(const float* from, const Gap& gap, C (&x)[N]) {
+        each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
+            constexpr int at = pair_of(2 * i, N);
+            load_two(from + 2 * at, gap, x[at], x[at + 1]);
+        });
+    }
     /** `packs` times W rows whose samples registers hold. */
     template <int N>
     static void tiny_rows(const float* in, float* out, const Gap& gap, int packs) {
@@ -496,10 +501,7 @@ struct LaneFfts {
                 });
             } else {
                 C x[N];
-                each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
-                    constexpr int at = pair_of(2 * i, N);
-                    load_two(in + 2 * at, gap, x[at], x[at + 1]);
-                });
+                load_rows(in, gap, x);
                 butterfly<N>(x);
                 each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
                     constexpr int at = pair_of(2 * i, N);
@@ -515,10 +517,7 @@ struct LaneFfts {
         for (int c = 0; c * W < rows; ++c) {
             const int row = lane_of(c, rows);
             C x[N];
-            each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
-                constexpr int at = pair_of(2 * i, N);
-                load_two(route.in + row * route.in_step + 2 * at, {route.in_step, 1.0F}, x[at], x[at + 1]);
-            });
+            load_rows(route.in + row * route.in_step, {route.in_step, 1.0F}, x);
             butterfly<N>(x);
             save<true>(x[0], route.zero + 2 * row);
             each<N - 1>([&](auto k) QUO_FFT_HERE {
