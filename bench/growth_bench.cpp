@@ -5,6 +5,8 @@
 
 #include <algorithm>
 #include <array>
+#include <charconv>
+#include <cmath>
 #include <cstddef>
 #include <cstdint>
 #include <filesystem>
@@ -13,6 +15,7 @@
 #include <numeric>
 #include <random>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "orbit/made_orbits.h"
@@ -78,6 +81,24 @@ void orbits(benchmark::internal::Benchmark* job) {
 }
 BENCHMARK(earth2sat<false>)->Name("earth2sat")->Apply(orbits);
 BENCHMARK(earth2sat<true>)->Name("earth2satPrecise")->Apply(orbits);
+
+/** Points anywhere on the Earth, seen far ahead or behind: the nearest pass mostly is not the one, and some are
+ * not seen at all. */
+void search_orbit(State& state) {
+    Sightings& scene = sightings(state);
+    std::vector<std::array<double, 3>> points(Sightings::kPoints);
+    for (auto& p : points) {
+        const double z = between(-1.0, 1.0), turn = between(0.0, 6.283), aside = 6.371e6 * std::sqrt(1.0 - z * z);
+        p = {aside * std::cos(turn), aside * std::sin(turn), 6.371e6 * z};
+    }
+    double t = 0.0, range = 0.0;
+    std::size_t i = 0;
+    for (auto _ : state) {
+        const std::size_t k = i++ % points.size();
+        benchmark::DoNotOptimize(scene.orbit.earth2sat(points[k].data(), &t, &range, k % 2 ? 130e3 : -17e3));
+    }
+}
+BENCHMARK(search_orbit)->Args({500, 4990})->Args({160000, 1599990});
 
 /** One load that waits for the one before it, from anywhere in a table as large as the runs of so many vectors. */
 void waiting_load(State& state) {
@@ -184,6 +205,21 @@ void read_values(State& state) {
 }
 BENCHMARK(read_values)->RangeMultiplier(10)->Range(1000, 1000000);
 
+/** The same without a document. */
+void pass_values(State& state) {
+    const std::string file = header_of_values(state.range(0));
+    const std::string path = std::string{kField} + "/val";
+    std::vector<double> values(static_cast<std::size_t>(state.range(0)));
+    while (state.KeepRunningBatch(state.range(0))) {
+        auto at = values.begin();
+        if (quorelxml::readTexts(file.c_str(), 1, path.c_str(), [&](std::string_view text) {
+                std::from_chars(text.data(), text.data() + text.size(), *at++);
+            }))
+            state.SkipWithError("failed");
+    }
+}
+BENCHMARK(pass_values)->RangeMultiplier(10)->Range(1000, 1000000);
+
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -197,6 +233,8 @@ int main(int argc, char** argv) {
             {"earth2sat: 160000 / 500 vectors 10 s apart", "earth2sat/160000/1599990", "earth2sat/500/4990", 5.0},
             {"earth2sat: 160000, 10 s apart / waiting load", "earth2sat/160000/1599990", "waiting_load/160000",
              10.0},
+            {"earth2sat, far off: 160000 / 500, 10 s apart", "search_orbit/160000/1599990",
+             "search_orbit/500/4990", 2.0},
             {"earth2satPrecise: 16001 / 17 over 160 s", "earth2satPrecise/16001/160", "earth2satPrecise/17/160",
              2.0},
             {"EvaluateDC: 240000 / 10 polynomials", "choose/240000", "choose/10", 6.0},
@@ -205,5 +243,7 @@ int main(int argc, char** argv) {
             {"rewrite: 6000 / 600 polynomials", "rewrite_polynomials/6000", "rewrite_polynomials/600", 1.2},
             {"rewrite: 240000 / 600 polynomials", "rewrite_polynomials/240000", "rewrite_polynomials/600", 1.2},
             {"read: 1000000 / 10000 values", "read_values/1000000", "read_values/10000", 1.2},
+            {"pass: 1000000 / 10000 values", "pass_values/1000000", "pass_values/10000", 1.2},
+            {"pass / read: 1000000 values", "pass_values/1000000", "read_values/1000000", 1.2},
         });
 }

@@ -5,6 +5,8 @@
 add_library(quo_flags INTERFACE)
 target_compile_options(quo_flags INTERFACE
     -Wall -Wextra -Wpedantic -Wconversion -Wshadow -Wformat=2
+    # Of which clang's counts every int that indexes a container of the standard library.
+    $<$<CXX_COMPILER_ID:Clang>:-Wno-sign-conversion>
     -fno-semantic-interposition
     # Results must not hang on which operations the compiler chose to fuse.
     -ffp-contract=off)
@@ -31,6 +33,16 @@ if(QUO_BUILD_FUZZ)
     # Every component tells the fuzzer which of its branches ran: without that it only tries inputs at random.
     target_compile_options(quo_flags INTERFACE -fsanitize=fuzzer-no-link)
 endif()
+
+# Compiles and analyses the sources of a target several at a time: what they include takes longer than they do. Those
+# that are named have names of their own in common with others, and stay apart.
+function(quo_compile_together target)
+    if(QUO_UNITY)
+        set_target_properties(${target} PROPERTIES UNITY_BUILD ON UNITY_BUILD_BATCH_SIZE 6
+            UNITY_BUILD_CODE_BEFORE_INCLUDE "// NOLINTNEXTLINE(bugprone-suspicious-include)")
+        set_source_files_properties(${ARGN} PROPERTIES SKIP_UNITY_BUILD_INCLUSION ON)
+    endif()
+endfunction()
 
 # quo_component(name SOURCES ... [HEADERS public ...] [DEPENDS component ...] [LINK library ...]). Private headers are
 # included by folder, "sarutillib/ground/file_io.h", and found for the component itself and all that it stands on: a
@@ -98,7 +110,7 @@ function(quo_test_headers)
     if(NOT TARGET quo_test_headers)
         file(CONFIGURE OUTPUT "${PROJECT_BINARY_DIR}/no_test.cpp" CONTENT "int main() {}\n")
         add_executable(quo_test_headers "${PROJECT_BINARY_DIR}/no_test.cpp")
-        target_compile_options(quo_test_headers PRIVATE -Wno-array-bounds -Wno-stringop-overflow)
+        target_compile_options(quo_test_headers PRIVATE -Wno-array-bounds $<$<CXX_COMPILER_ID:GNU>:-Wno-stringop-overflow>)
         set_target_properties(quo_test_headers PROPERTIES QUO_LAST_OPTIONS "${quo_quick_build}")
         target_link_libraries(quo_test_headers PRIVATE quo_flags GTest::gmock)
         target_precompile_headers(quo_test_headers PRIVATE "${PROJECT_SOURCE_DIR}/tests/support/prelude.h")
@@ -112,7 +124,7 @@ function(quo_test name)
     set(target ${name}_test)
     add_executable(${target} ${arg_SOURCES})
     # The compiler forgets of precompiled headers that they are the system's, and warns of what it finds in them.
-    target_compile_options(${target} PRIVATE -Wno-array-bounds -Wno-stringop-overflow)
+    target_compile_options(${target} PRIVATE -Wno-array-bounds $<$<CXX_COMPILER_ID:GNU>:-Wno-stringop-overflow>)
     set_target_properties(${target} PROPERTIES QUO_LAST_OPTIONS "${quo_quick_build}")
     quo_test_headers()
     target_precompile_headers(${target} REUSE_FROM quo_test_headers)

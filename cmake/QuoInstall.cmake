@@ -1,5 +1,7 @@
-# What is installed, in three components: runtime (the library and its FFT engine), development (headers, CMake
-# package, pkg-config file), tools (the command-line tool, its manual pages and completion).
+# What is installed, in components: runtime (the library, the modules that it loads, and the licence), development
+# (headers, CMake package, pkg-config file, documentation and examples), tools (the command-line tool, its manual pages
+# and completion), python (the package for Debian's Python) and, only where it is asked for, wheel (the same with the
+# library inside).
 include(CMakePackageConfigHelpers)
 
 install(TARGETS quo_base EXPORT quo_base_targets
@@ -10,6 +12,14 @@ install(DIRECTORY "${PROJECT_SOURCE_DIR}/include/quo_base" DESTINATION ${CMAKE_I
 install(FILES "${TRIO_INCLUDE_DIR}/trio.h" "${TRIO_INCLUDE_DIR}/triop.h" "${TRIO_INCLUDE_DIR}/triodef.h"
               "${TRIO_INCLUDE_DIR}/triostr.h" "${TRIO_INCLUDE_DIR}/trionan.h"
         DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/quo_base/trio)
+
+# Beside each other as in the source tree, so that their links hold.
+install(FILES "${PROJECT_SOURCE_DIR}/LICENSE" "${PROJECT_SOURCE_DIR}/NOTICE" DESTINATION ${CMAKE_INSTALL_DOCDIR}
+        COMPONENT runtime)
+install(FILES "${PROJECT_SOURCE_DIR}/README.md" "${PROJECT_SOURCE_DIR}/CHANGELOG.md" DESTINATION ${CMAKE_INSTALL_DOCDIR})
+install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples" DESTINATION ${CMAKE_INSTALL_DOCDIR})
+install(DIRECTORY "${PROJECT_SOURCE_DIR}/docs" DESTINATION ${CMAKE_INSTALL_DOCDIR}
+        FILES_MATCHING PATTERN "*.md" PATTERN "*.png" PATTERN doxygen EXCLUDE)
 
 set(config_dir ${CMAKE_INSTALL_LIBDIR}/cmake/quo_base)
 install(EXPORT quo_base_targets FILE quo_base-targets.cmake NAMESPACE quo_base:: DESTINATION ${config_dir})

@@ -36,6 +36,20 @@ set(CPACK_DEBIAN_TOOLS_PACKAGE_DEPENDS "libquo-base1 (= ${PROJECT_VERSION})")
 set(CPACK_COMPONENT_TOOLS_DESCRIPTION "radar geometry and products at the command line
  The tool quo geolocates image samples, checks and changes product headers,
  converts and shows rasters, and fits and derives polynomials.")
+
+if(QUO_PYTHON)
+    list(APPEND CPACK_COMPONENTS_ALL python)
+    set(CPACK_DEBIAN_PYTHON_PACKAGE_NAME python3-quo-base)
+    set(CPACK_DEBIAN_PYTHON_PACKAGE_SECTION python)
+    set(CPACK_DEBIAN_PYTHON_PACKAGE_DEPENDS "libquo-base1 (= ${PROJECT_VERSION}), ${QUO_PYTHON_DEPENDS}")
+    set(CPACK_DEBIAN_PYTHON_PACKAGE_SUGGESTS
+        "python3-xarray, python3-dask, python3-distributed, python3-rasterio, python3-pyproj, python3-matplotlib")
+    set(CPACK_DEBIAN_PYTHON_PACKAGE_CONTROL_EXTRA
+        "${PROJECT_SOURCE_DIR}/cmake/debian/python/postinst;${PROJECT_SOURCE_DIR}/cmake/debian/python/prerm")
+    set(CPACK_COMPONENT_PYTHON_DESCRIPTION "radar geometry and products in Python
+ Products, orbits, rasters, polynomials and transforms with numpy arrays, maps
+ of images, and data sets for xarray and dask.")
+endif()
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS_PRIVATE_DIRS "${PROJECT_BINARY_DIR}/libsrc")
 
 # Packing what was built, without looking first whether tests and benchmarks are up to date.

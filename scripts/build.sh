@@ -9,7 +9,7 @@ log=$(mktemp)
 trap 'rm -f "$log"' EXIT
 echo "Building the $preset preset"
 [ $# -eq 0 ] || set -- --target "$@"
-if ! { cmake --preset "$preset" && cmake --build "build/$preset" "$@"; } >"$log" 2>&1; then
+if ! { cmake --preset "$preset" && cmake --build --preset "$preset" "$@"; } >"$log" 2>&1; then
     cat "$log" >&2
     exit 1
 fi

@@ -9,7 +9,7 @@ cd "$(dirname "$0")/.."
 jobs=${1:-$(nproc)}
 build=$PWD/build/coverage
 mkdir -p "$build"
-cmake -S . -B "$build" -G Ninja -DCMAKE_BUILD_TYPE=Coverage -DQUO_BUILD_BENCH=OFF \
+cmake -S . -B "$build" -G Ninja -DCMAKE_BUILD_TYPE=Coverage -DQUO_BUILD_TESTS=ON \
     -DCMAKE_C_FLAGS=--coverage -DCMAKE_CXX_FLAGS=--coverage \
     -DCMAKE_EXE_LINKER_FLAGS=-Wl,-u,__gcov_dump >"$build/log"
 ninja -j "$jobs" -C "$build" >>"$build/log"

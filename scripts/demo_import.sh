@@ -10,7 +10,7 @@ rm -rf "$folder"
 mkdir -p "$folder"
 cp -r tests/data/sentinel1/S1A_IW_SLC*.SAFE "$folder"
 annotation=$(ls "$folder"/*.SAFE/annotation/*.xml)
-"$1/tests/quo/make_measurement" "$annotation"
+"$1/examples/make_measurement" "$annotation"
 
 echo
 echo "A Sentinel-1 sub-swath of three bursts, taken over without copying its samples:"

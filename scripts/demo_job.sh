@@ -17,3 +17,6 @@ printf 'azimuth_time_s,range_time_s\n1133090050.25,0.0058123\n' |
 scripts/demo_product.sh "$1"
 scripts/demo_import.sh "$1"
 scripts/demo_chain.sh "$1"
+scripts/demo_python.sh "$1"
+echo
+echo "To run quo from any folder: PATH=$PWD/$1/tools/quo:\$PATH"

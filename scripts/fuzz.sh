@@ -1,17 +1,18 @@
 #!/bin/sh
-# Builds the fuzz targets and runs each from its seeds for so many seconds. Fails for a target that crashes, leaks or
-# hangs, and for one whose coverage does not grow beyond that of its seeds: it would be looking at nothing. An input
-# that was found to fail is kept in build/fuzz/found.
-# Usage: scripts/fuzz.sh SECONDS [BUILT_TARGET...], which without targets builds and takes all
+# Builds the fuzz targets and runs them one after the other from their seeds, for so many minutes in all; 0.5 is a quick
+# look. Fails for a target that crashes, leaks or hangs, and for one whose coverage does not grow beyond that of its
+# seeds: it would be looking at nothing. An input that was found to fail is kept in build/fuzz/found.
+# Usage: scripts/fuzz.sh MINUTES [BUILT_TARGET...], which without targets builds and takes all
 set -eu
-[ $# -ge 1 ] || { echo "Usage: scripts/fuzz.sh SECONDS [BUILT_TARGET...]" >&2; exit 2; }
+[ $# -ge 1 ] || { echo "Usage: scripts/fuzz.sh MINUTES [BUILT_TARGET...]" >&2; exit 2; }
 cd "$(dirname "$0")/.."
-seconds=$1
+minutes=$1
 shift
 if [ $# -eq 0 ]; then
     scripts/build.sh fuzz fuzz_targets
     set -- build/fuzz/fuzz/*_fuzz
 fi
+seconds=$(awk -v minutes="$minutes" -v targets=$# 'BEGIN { print int(60 * minutes / targets + 1) }')
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 mkdir -p build/fuzz/found
@@ -34,7 +35,8 @@ for target in "$@"; do
     if [ "$verdict" = fine ] && [ "${reached:-0}" -le "${seeds:-0}" ]; then
         verdict="FAILED, its coverage did not grow"
     fi
-    echo "$name: $verdict; branches: ${seeds:-none} from the seeds, ${reached:-none} in the end"
+    inputs=$(sed -n 's/^#\([0-9]*\)[[:space:]]*DONE.*/\1/p' "$log")
+    echo "$name: $verdict; ${inputs:-no} inputs; branches: ${seeds:-none} from the seeds, ${reached:-none} in the end"
     if [ "$verdict" != fine ]; then
         failed=1
         tail -n 60 "$log" >&2

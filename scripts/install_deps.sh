@@ -1,17 +1,21 @@
 #!/bin/sh
 # Installs the Debian packages that building and testing need. Quick and silent when nothing is missing.
-# Usage: scripts/install_deps.sh [--with-mkl]
+# Usage: scripts/install_deps.sh [--demo | --with-mkl]
+# --demo leaves out what only tests need.
 # --with-mkl adds the FFT engine MKL, which is not free software: Debian keeps it in its component non-free. It does
 # not become the system's BLAS.
 set -eu
 
-packages="git pkg-config ca-certificates g++ cmake ninja-build libxml2-dev libtrio-dev libcli11-dev
-nlohmann-json3-dev libpng-dev libcairo2-dev libtiff-dev libfftw3-dev libgtest-dev libgmock-dev libbenchmark-dev liblapack-dev libeigen3-dev
-clang-format clang-tidy dpkg-dev file lintian help2man doxygen gdal-bin pybind11-dev python3-dev python3-numpy
-python3-pytest python3-xarray python3-dask python3-distributed python3-rasterio python3-pyproj python3-pyflakes"
+packages="pkg-config ca-certificates g++ cmake ninja-build libxml2-dev libtrio-dev libcli11-dev nlohmann-json3-dev libpng-dev
+libcairo2-dev libtiff-dev libfftw3-dev pybind11-dev python3-dev python3-numpy python3-matplotlib python3-rasterio python3-pyproj
+python3-xarray"
+tests="git libgtest-dev libgmock-dev libbenchmark-dev liblapack-dev libeigen3-dev clang-format clang-tidy clang libclang-rt-dev
+valgrind time abigail-tools dpkg-dev file lintian help2man doxygen gdal-bin python3-pytest python3-pip python3-dask
+python3-distributed python3-pyflakes"
 case "${1:-}" in
-"") ;;
---with-mkl) packages="$packages libmkl-rt" ;;
+"") packages="$packages $tests" ;;
+--demo) ;;
+--with-mkl) packages="$packages $tests libmkl-rt" ;;
 *)
     echo "install_deps.sh: unknown option $1" >&2
     exit 2

@@ -36,7 +36,9 @@ std::uint32_t count_in(const std::string& annotation, const std::string& element
 
 /** An empty TIFF in one strip, of complex samples of twice 16 bits. */
 void make_tiff(const fs::path& name, std::uint32_t lines, std::uint32_t samples) {
-    const std::uint32_t bytes = lines * samples * 4U;
+    const std::uint64_t all = std::uint64_t{lines} * samples;
+    if (all > (UINT32_MAX - kSamplesAt) / 4U) throw std::runtime_error{"more samples than a TIFF has room for"};
+    const auto bytes = static_cast<std::uint32_t>(all * 4U);
     const std::array<std::array<std::uint32_t, 2>, 10> entries{{{256, samples},
                                                                 {257, lines},
                                                                 {258, 32},

@@ -56,6 +56,11 @@ Program::Program(const char* about, const char* name)
 
 void Program::version(const char* text) { app_->set_version_flag("--version", text); }
 
+void Program::examples(const char* verb, const std::string& lines) {
+    CLI::App* const app = app_->get_subcommand(verb);
+    app->footer(app->get_footer() + "\nExamples:\n" + lines);
+}
+
 void Program::change(std::span<const std::string_view> names, std::string (*changed)(std::string)) {
     for (CLI::App* verb : app_->get_subcommands({}))
         for (CLI::Option* option : verb->get_options())

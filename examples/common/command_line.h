@@ -72,6 +72,8 @@ public:
 
     /** Declares --version. */
     void version(const char* text);
+    /** Shows examples of a verb at the end of its help, lines as they are typed. */
+    void examples(const char* verb, const std::string& lines);
     /** Puts what `changed` makes of it in the place of each value of a verb's options of these names. */
     void change(std::span<const std::string_view> names, std::string (*changed)(std::string));
 

@@ -6,13 +6,16 @@
 #include <cstdio>
 #include <exception>
 #include <filesystem>
+#include <fstream>
 #include <stdexcept>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "quo_base/ckerr.h"
 #include "quo_base/generalSAR.h"
 #include "quo_base/quorelReport.h"
+#include "same_file.h"
 
 namespace example {
 
@@ -36,6 +39,28 @@ inline void write_product(GeneralSAR& product, const std::string& header) {
     if (!std::filesystem::exists(header, failure)) throw Failure{header + ": cannot be written"};
 }
 
+/** Where write_file() collects what is going to be a file. */
+inline std::string unfinished_name(const std::string& name) { return name + ".part"; }
+
+/** Writes a file beside its name and puts it there in one step, so that an older one of that name stays whole
+ * until then. Links lead to the new one; a device or a pipe is written to. Throws Failure. */
+inline void write_file(const std::string& name, std::string_view bytes) {
+    std::error_code failure, ignored;
+    const std::string target = std::filesystem::weakly_canonical(name, ignored).string();
+    const bool replaced =
+        !std::filesystem::exists(target, ignored) || std::filesystem::is_regular_file(target, ignored);
+    const std::string unfinished = replaced ? unfinished_name(target) : target;
+    std::ofstream stream{unfinished, std::ios::binary};
+    const bool created = stream.is_open() && replaced;
+    stream << bytes;
+    stream.close();
+    const bool written = !stream.fail();
+    if (written && replaced) std::filesystem::rename(unfinished, target, failure);
+    if (created && (!written || failure)) std::filesystem::remove(unfinished, ignored);
+    errno = 0;  // what that left would count as an error of the next function of the library
+    if (!written || failure) throw Failure{name + ": cannot be written"};
+}
+
 /** The files that a program reads and those that it writes. */
 struct Files {
     std::vector<std::string> read, written;
@@ -43,13 +68,10 @@ struct Files {
 
 /** Throws where a file to be written is one that is read, by whatever name or link, or stands there twice: the
  * program would destroy what it needs. Names of no file yet are apart from all. */
-inline void require_apart(const Files& files) {
-    std::error_code error;
-    const auto same = [&](const std::string& a, const std::string& b) {
-        return a == b || (std::filesystem::is_regular_file(a, error) && std::filesystem::equivalent(a, b, error));
-    };
-    std::vector<std::string> others = files.read;
-    for (const std::string& name : files.written) {
+inline void require_apart(const Files& given) {
+    const auto same = [](const std::string& a, const std::string& b) { return a == b || files::same_file(a, b); };
+    std::vector<std::string> others = given.read;
+    for (const std::string& name : given.written) {
         if (std::ranges::any_of(others, [&](const std::string& other) { return same(name, other); }))
             throw Failure{name + ": would replace a file that the program needs"};
         others.push_back(name);

@@ -16,7 +16,8 @@ struct Target {
 };
 
 /** Reads targets from a table of comma-separated values with the columns name, latitude_deg, longitude_deg,
- * height_m, strength, in this order, under a line of column names. Lines that begin with # are skipped. */
+ * height_m, strength, in this order, under a line of column names. Lines that begin with # are skipped. Throws
+ * Failure with the number of the line for one that is no target, and for one with the name of another. */
 std::vector<Target> read_targets(const std::string& file);
 
 }  // namespace example

@@ -1,7 +1,6 @@
 // Measures point targets in a focused image: position, resolution, sidelobes, phase.
 #include <algorithm>
 #include <cstdio>
-#include <fstream>
 #include <string>
 
 #include "../common/command_line.h"
@@ -24,9 +23,7 @@ void measure(const Options& options) {
     if (!options.picture.empty()) {
         const auto shown = std::ranges::find(found, name, &example::Measurement::name);
         if (shown == found.end()) throw example::Failure{"no target " + name};
-        const std::string bytes = png_of(example::portrait(*shown, closeup));
-        if (!(std::ofstream{options.picture, std::ios::binary} << bytes << std::flush))
-            throw example::Failure{options.picture + ": cannot be written"};
+        example::write_file(options.picture, png_of(example::portrait(*shown, closeup)));
     }
     if (!std::all_of(found.begin(), found.end(), example::within_bounds))
         throw example::Failure{"a target is further off than 0.1 samples, 5 % in resolution or 0.1 rad"};
@@ -44,7 +41,8 @@ int main(int argc, char** argv) {
     app.takes("--target", options.portrayed, "Which target that is (the first)");
     if (const auto status = app.parse(argc, argv)) return *status;
     example::Files files{{options.image, options.image + ".hdr", options.targets}, {}};
-    if (!options.picture.empty()) files.written.push_back(options.picture);
+    if (!options.picture.empty())
+        files.written.insert(files.written.end(), {options.picture, example::unfinished_name(options.picture)});
     return example::run_program("Point targets", files, options.image + ".targets.report.txt", "", 1,
                                 [&] { measure(options); });
 }

@@ -3,10 +3,13 @@
 #include <algorithm>
 #include <cmath>
 #include <complex>
+#include <limits>
 #include <numbers>
 
 #include "../common/session.h"
+#include "quo_base/derived_raster.h"
 #include "quo_base/generalSAR.h"
+#include "quo_base/image_grid.h"
 #include "quo_base/interp.h"
 
 namespace example {
@@ -16,6 +19,14 @@ constexpr double kPi = std::numbers::pi;
 constexpr int kChip = 64;  // lines and samples that are looked at
 constexpr int kFiner = Closeup::finer;
 constexpr int kFine = kChip * kFiner;
+
+/** An image, and the grid on which its pixels stand. */
+struct Image {
+    GeneralSAR product;
+    ImageGrid_Obj grid;
+
+    [[nodiscard]] bool is_detected() const { return product.bufferFile.is_complex() == 0; }
+};
 
 /** An image around a target, finely interpolated: kFine rows of azimuth by kFine columns of range. */
 class Chip {
@@ -42,7 +53,14 @@ Chip::Chip(BufferFile& image, int line, int sample, double doppler_cycles) {
         first_sample + kChip > image.getSamples())
         throw Failure{"a target lies outside the image, or at its border"};
     std::vector<fcomplex> chip(kSize), turned(kSize);
-    image.readbuffer(chip.data(), first_line, kChip, first_sample, kChip);
+    if (image.is_complex() != 0) {
+        image.readbuffer(chip.data(), first_line, kChip, first_sample, kChip);
+    } else {
+        std::vector<float> detected(kSize);
+        image.readbuffer(detected.data(), first_line, kChip, first_sample, kChip);
+        std::ranges::copy(detected, chip.begin());
+    }
+    require(image.status(), "the image cannot be read");
 
     // The phase ramp of the Doppler centroid runs along azimuth, demodulationPhase along rows.
     for (std::size_t i = 0; i < kSize; ++i) turned[i % kChip * kChip + i / kChip] = chip[i];
@@ -116,11 +134,15 @@ Response respond(const Cut& cut, double shift, double theory) {
 }
 
 /** Opens an image by its header. */
-void open_image(const std::string& image, GeneralSAR& product) {
+void open_image(const std::string& image, Image& opened) {
     const std::string header = image + ".hdr";
+    GeneralSAR& product = opened.product;
     require(product.GSread(header.c_str()), header + ": cannot be read");
-    for (const GSObject object : {gsOrbit, gsRoi, gsPolySAR, gsSamplingConstants, gsBufferFile})
+    for (const GSObject object : {gsOrbit, gsSamplingConstants, gsBufferFile})
         if (!product.GSexists(object)) throw Failure{header + ": a section is missing"};
+    if (!opened.is_detected() && !product.GSexists(gsPolySAR))
+        throw Failure{header + ": no Doppler centroid (section PolySAR)"};
+    require(read_image_grid(header.c_str(), product, opened.grid), header + ": does not place the pixels");
     product.bufferFile.setFilename(image.c_str());
     product.bufferFile.open(BufferFile::READ);
     if (!product.bufferFile.is_open()) throw Failure{image + ": cannot be read"};
@@ -138,19 +160,61 @@ Closeup close_up(const Chip& chip, int row, int column) {
     return closeup;
 }
 
-Measurement find(GeneralSAR& product, const Target& target, Closeup* closeup) {
-    const ROI_Obj& roi = product.roi.Roi;
+/** Lines from a line to the nearer end of its burst; the lines beyond belong to another time. */
+double room_in_burst(const ImageGrid_Obj& grid, double line) {
+    if (grid.Bursts == 0) return std::numeric_limits<double>::infinity();
+    const double after = std::fmod(line + grid.FirstLine + 0.5, grid.LinesPerBurst);
+    return std::min(after, grid.LinesPerBurst - after);
+}
+
+struct Pixel {
+    double line, sample;
+};
+
+/** The pixel of what is seen at some times; of two bursts that see it, in the one with more lines around it. */
+Pixel pixel_of(const ImageGrid_Obj& grid, double azimuth_s, double range_s, const std::string& name) {
+    Pixel pixel{};
+    double later_line = 0.0;
+    std::int32_t status = 0;
+    const int refused =
+        grid.timePixels({1, &azimuth_s, &range_s}, {&pixel.line, &later_line, &pixel.sample, &status});
+    require(refused != QUO_OK ? refused : status, name + " lies on no pixel");
+    if (room_in_burst(grid, later_line) > room_in_burst(grid, pixel.line)) pixel.line = later_line;
+    if (room_in_burst(grid, pixel.line) < 0.5 * kChip) throw Failure{name + " lies at the border of a burst"};
+    return pixel;
+}
+
+struct Times {
+    double azimuth_s, range_s;
+};
+Times times_of(const ImageGrid_Obj& grid, const Pixel& pixel) {
+    Times times{};
+    std::int32_t status = 0;
+    const int refused =
+        grid.pixelTimes({1, &pixel.line, &pixel.sample}, {&times.azimuth_s, &times.range_s, &status});
+    require(refused != QUO_OK ? refused : status, "the times of a pixel");
+    return times;
+}
+
+/** From sample to sample, which in ground range hangs on where they are. */
+double range_step_s(const ImageGrid_Obj& grid, const Pixel& at) {
+    return times_of(grid, {at.line, at.sample + 0.5}).range_s - times_of(grid, {at.line, at.sample - 0.5}).range_s;
+}
+
+Measurement find(Image& image, const Target& target, Closeup* closeup) {
+    auto& [product, grid] = image;
     const SamplingConstants_Obj& sampling = product.samplingConstants;
     double place[3], located[3];
     geodetic_to_xyz(&target.place, QUO_WGS84_EQUATORIAL_M, QUO_WGS84_POLAR_M, place);
     double azimuth_s = 0.0, range_s = 0.0, doppler_hz = 0.0;
     require(product.orbit.earth2sat(place, &azimuth_s, &range_s), target.name + " is not seen");
-    require(product.polynomials.EvaluateDC(range_s, azimuth_s, &doppler_hz), "the Doppler centroid");
-    const double line = (azimuth_s - roi.SlowStartTime) / roi.SlowTimeDelta;
-    const double sample = (range_s - roi.FastStartTime) / roi.FastTimeDelta;
+    if (!image.is_detected())
+        require(product.polynomials.EvaluateDC(range_s, azimuth_s, &doppler_hz), "the Doppler centroid");
+    const Pixel place_in_image = pixel_of(grid, azimuth_s, range_s, target.name);
+    const auto& [line, sample] = place_in_image;
     const int middle_line = static_cast<int>(std::lround(line));
     const int middle_sample = static_cast<int>(std::lround(sample));
-    const Chip chip{product.bufferFile, middle_line, middle_sample, doppler_hz * roi.SlowTimeDelta};
+    const Chip chip{product.bufferFile, middle_line, middle_sample, doppler_hz * grid.LineStep_s};
 
     const auto [row, column] = chip.brightest();
     if (closeup != nullptr) *closeup = close_up(chip, row, column);
@@ -160,7 +224,7 @@ Measurement find(GeneralSAR& product, const Target& target, Closeup* closeup) {
     const double columns = column + parabola_peak(amplitude(row, column - 1), top, amplitude(row, column + 1));
     const double chip_line = rows / kFiner;  // after the chip's first line
     const int first_line = middle_line - kChip / 2, first_sample = middle_sample - kChip / 2;
-    const double peak_line = first_line + chip_line, peak_sample = first_sample + columns / kFiner;
+    const Pixel peak{first_line + chip_line, first_sample + columns / kFiner};
 
     Cut along{{}, row}, across{{}, column};
     for (int i = 0; i < kFine; ++i) {
@@ -169,18 +233,20 @@ Measurement find(GeneralSAR& product, const Target& target, Closeup* closeup) {
     }
     Measurement found{};
     found.name = target.name;
-    found.azimuth = respond(along, peak_line - line, 0.886 * sampling.prf_hz / sampling.Baz_hz);
-    found.range = respond(across, peak_sample - sample, 0.886 * sampling.frg_hz / sampling.Brg_hz);
-    require(product.orbit.sat2earth(roi.SlowStartTime + peak_line * roi.SlowTimeDelta,
-                                    roi.FastStartTime + peak_sample * roi.FastTimeDelta, 0.0,
-                                    target.place.height_m, located),
+    found.azimuth = respond(along, peak.line - line, 0.886 / (grid.LineStep_s * sampling.Baz_hz));
+    found.range =
+        respond(across, peak.sample - sample, 0.886 / (range_step_s(grid, place_in_image) * sampling.Brg_hz));
+    const Times seen = times_of(grid, peak);
+    require(product.orbit.sat2earth(seen.azimuth_s, seen.range_s, 0.0, target.place.height_m, located),
             "a ground point");
     found.ground_m = norm(quo::load(located) - quo::load(place));
     found.strength_db = 20.0 * std::log10(top / target.strength);
+    found.phase_rad = std::numeric_limits<double>::quiet_NaN();
+    if (image.is_detected()) return found;
     // The centroid's ramp is put on again at the peak; between the fine places the phase hardly changes without
     // it.
-    const double phase = static_cast<double>(std::arg(chip.at(row, column))) +
-                         2.0 * kPi * doppler_hz * roi.SlowTimeDelta * chip_line;
+    const double phase =
+        static_cast<double>(std::arg(chip.at(row, column))) + 2.0 * kPi * doppler_hz * grid.LineStep_s * chip_line;
     found.phase_rad =
         std::remainder(phase + 2.0 * kPi * range_s * quo::kLightSpeed / sampling.lambda_m, 2.0 * kPi);
     return found;
@@ -190,12 +256,12 @@ Measurement find(GeneralSAR& product, const Target& target, Closeup* closeup) {
 
 std::vector<Measurement> measure(const std::string& image, const std::vector<Target>& targets,
                                  const std::string& portrayed, Closeup* closeup) {
-    GeneralSAR product;
-    open_image(image, product);
+    Image opened;
+    open_image(image, opened);
     std::vector<Measurement> found;
     found.reserve(targets.size());
     for (const Target& target : targets)
-        found.push_back(find(product, target, target.name == portrayed ? closeup : nullptr));
+        found.push_back(find(opened, target, target.name == portrayed ? closeup : nullptr));
     return found;
 }
 
@@ -217,7 +283,8 @@ bool within_bounds(const Measurement& measurement) {
     const auto good = [](const Response& response) {
         return std::abs(response.shift) < 0.1 && std::abs(response.resolution / response.theory - 1.0) < 0.05;
     };
-    return good(measurement.azimuth) && good(measurement.range) && std::abs(measurement.phase_rad) < 0.1;
+    const bool off_phase = std::abs(measurement.phase_rad) >= 0.1;  // not of an image without phases
+    return good(measurement.azimuth) && good(measurement.range) && !off_phase;
 }
 
 }  // namespace example

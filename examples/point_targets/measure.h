@@ -23,7 +23,7 @@ struct Measurement {
     std::string name;
     Response azimuth, range;
     double ground_m;     // distance of the located peak from the given position
-    double phase_rad;    // at the peak, against -4 pi R / lambda
+    double phase_rad;    // at the peak, against -4 pi R / lambda; not-a-number in a detected image
     double strength_db;  // amplitude at the peak, against the given strength
 };
 
@@ -41,7 +41,8 @@ struct Closeup {
 
 /** Finds the targets in an image whose product header is "<image>.hdr" and measures their responses.
  *
- * A target is expected where the orbit passes it at zero Doppler, within some lines and samples. The image is
+ * A target is expected where the orbit passes it at zero Doppler, within some lines and samples: of an image of
+ * bursts in the one that has more lines around it. Images may be detected and in ground range. The image is
  * interpolated there by zero-padding its spectrum, after its Doppler centroid was taken off. Throws Failure.
  * The closeup is that of the target `portrayed`, empty without one of that name. */
 std::vector<Measurement> measure(const std::string& image, const std::vector<Target>& targets,
@@ -50,7 +51,8 @@ std::vector<Measurement> measure(const std::string& image, const std::vector<Tar
 /** Prints the measurements as a table. */
 void print_table(std::FILE* out, const std::vector<Measurement>& measurements);
 
-/** Whether position, resolution and phase are within 0.1 samples, 5 % and 0.1 rad of what they should be. */
+/** Whether position, resolution and phase, where there is one, are within 0.1 samples, 5 % and 0.1 rad of what
+ * they should be. */
 bool within_bounds(const Measurement& measurement);
 
 }  // namespace example

@@ -52,10 +52,12 @@ public:
 private:
     void read_header();
     void check_memory(int lines, int samples) const;
+    void make_room(int lines);
     void create(DataFile& raster, const std::string& name, int lines, int samples);
     void finish(DataFile& raster);
     void compress_range();
     void focus_azimuth();
+    void write_lines(Block& block, int first, int lines);
     void write_block(Block& block, int line, int sample);
     void write_header();
 
@@ -71,6 +73,7 @@ private:
     DopplerBand band_{};
     ROI_Obj data_;  // the compressed data
     DataFile compressed_, image_;
+    std::optional<Block> core_;  // the compressed data, where they are kept in memory
     BlockLayout layout_{};
 };
 
@@ -130,7 +133,7 @@ struct Done {
 /** What a thread compresses raw lines with. */
 class Processor::RangeWorker {
 public:
-    RangeWorker(const Processor& processor, int lines)
+    RangeWorker(Processor& processor, int lines)
         : processor_{processor},
           lines_{lines},
           compression_{processor.product_.pulse, processor.conf_, processor.product_.roi.Roi.Samples, lines} {
@@ -145,6 +148,7 @@ public:
         const int count = std::min(lines_, processor_.product_.roi.Roi.Lines - piece.line);
         stopwatch.time(kReading, [&] { read(piece.line, count); });
         compression_.compress(stopwatch);
+        if (processor_.core_) stopwatch.time(kWriting, [&] { keep(piece.line, count); });
         return {piece, &compression_.block(), stopwatch};
     }
 
@@ -157,15 +161,36 @@ private:
             raw_.readbuffer(samples, first + line, 1, 0, 0);
             std::fill(samples + count, samples + block.samples(), fcomplex{});
         }
+        std::fill(block.line(lines), block.line(block.lines()), fcomplex{});
     }
 
-    const Processor& processor_;
+    void keep(int first, int lines) {
+        Block& core = *processor_.core_;
+        for (int line = 0; line < lines; ++line)
+            std::copy_n(compression_.block().line(line), core.samples(), core.line(first + line));
+    }
+
+    Processor& processor_;
     int lines_;
     BufferFile raw_;
     RangeCompression compression_;
 };
 
-/** Compresses the raw lines into the intermediate raster. */
+/** Writes compressed lines into the intermediate raster. */
+void Processor::write_lines(Block& block, int first, int lines) {
+    BufferIO region{&compressed_, 0, data_.Samples, first, lines, FLOAT_COMPLEX};
+    require(region.writebuffer(reinterpret_cast<const char*>(block.data()), block.samples()),
+            std::string{compressed_.FileName} + ": cannot be written");
+}
+
+/** Where the compressed data are to stand: in memory, or in a raster. */
+void Processor::make_room(int lines) {
+    if (processing_.Flag_incore == 0) return create(compressed_, compressed_raster(job_), lines, data_.Samples);
+    check_memory(lines, data_.Samples);
+    core_.emplace(lines, data_.Samples);
+}
+
+/** Compresses the raw lines. */
 void Processor::compress_range() {
     const int raw_samples = product_.roi.Roi.Samples, lines = product_.roi.Roi.Lines;
     // Several in the room of a block in azimuth, which there are few of: the threads end at nearly the same time.
@@ -182,7 +207,7 @@ void Processor::compress_range() {
     data_.SetSlowAxe(product_.roi.Roi.SlowStartTime, 1.0 / band_.prf_hz, lines);
     data_.SetFastAxe(product_.roi.Roi.FastStartTime + compression.delay_s(), product_.roi.Roi.FastTimeDelta,
                      compression.samples());
-    create(compressed_, compressed_raster(job_), lines, data_.Samples);
+    make_room(lines);
     int line = 0;
     const auto next = [&]() -> std::optional<Piece> {
         if (line >= lines) return std::nullopt;
@@ -191,28 +216,26 @@ void Processor::compress_range() {
     const auto write = [&](const Done& done) {
         stopwatch_.add(done.stopwatch);
         const int first = done.piece.line;
-        stopwatch_.time(kWriting, [&] {
-            BufferIO region{&compressed_, 0, data_.Samples, first, std::min(block_lines, lines - first),
-                            FLOAT_COMPLEX};
-            require(region.writebuffer(reinterpret_cast<const char*>(done.block->data()), done.block->samples()),
-                    std::string{compressed_.FileName} + ": cannot be written");
-        });
+        if (!core_)
+            stopwatch_.time(kWriting,
+                            [&] { write_lines(*done.block, first, std::min(block_lines, lines - first)); });
         progress_.show(kRangeShare * first / lines);
     };
     auto worker = workers.begin();
     blocks::in_order(
         job_.threads, next,
         [&] { return [own = (worker++)->get()](const Piece& piece) { return own->compress(piece); }; }, write);
-    finish(compressed_);
+    if (!core_) finish(compressed_);
 }
 
 /** What a thread focuses blocks with. Its orbit is as freshly read for every block, whoever had the one before. */
 class Processor::AzimuthWorker {
 public:
-    explicit AzimuthWorker(const Processor& processor)
+    explicit AzimuthWorker(Processor& processor)
         : processor_{processor}, focusing_{processor.layout_, processor.band_, processor.data_.FastTimeDelta} {
         const std::string header = processor.job_.raw + ".hdr", raster = compressed_raster(processor.job_);
         require(product_.GSread(header.c_str()), header + ": cannot be read");
+        if (processor.core_) return;
         compressed_.copyDescription(processor.compressed_);
         require(compressed_.setFilename(raster.c_str()), raster);
         require(compressed_.open(0), raster + ": cannot be read");
@@ -244,7 +267,7 @@ private:
         histories_.emplace(product_, strip_, processor_.job_.height_m);
     }
 
-    /** Reads what the raster has of a block; beyond its borders there are zeros. */
+    /** Reads what there is of a block; beyond the borders there are zeros. */
     void read(int first_line, int first_sample) {
         Block& block = focusing_.block();
         const ROI_Obj& data = processor_.data_;
@@ -253,13 +276,18 @@ private:
         const int right = std::min(data.Samples, first_sample + block.samples());
         if (bottom - top < block.lines() || right - left < block.samples())
             std::fill_n(block.data(), block.size(), fcomplex{});
-        BufferIO region{&compressed_, left, right - left, top, bottom - top, FLOAT_COMPLEX};
         fcomplex* corner = block.line(top - first_line) + (left - first_sample);
+        if (processor_.core_) {
+            for (int line = top; line < bottom; ++line, corner += block.samples())
+                std::copy_n(processor_.core_->line(line) + left, right - left, corner);
+            return;
+        }
+        BufferIO region{&compressed_, left, right - left, top, bottom - top, FLOAT_COMPLEX};
         require(region.readbuffer(reinterpret_cast<char*>(corner), block.samples()),
                 std::string{compressed_.FileName} + ": cannot be read");
     }
 
-    const Processor& processor_;
+    Processor& processor_;
     AzimuthFocusing focusing_;
     GeneralSAR product_;
     DataFile compressed_;
@@ -313,7 +341,7 @@ void Processor::focus_azimuth() {
         job_.threads, next, [&] { return [own = (worker++)->get()](const Piece& at) { return own->focus(at); }; },
         write);
     finish(image_);
-    if (processing_.EraseTemp != 0)
+    if (processing_.EraseTemp != 0 && !core_)
         stopwatch_.time(kWriting, [&] { std::filesystem::remove(compressed_.FileName); });
 }
 

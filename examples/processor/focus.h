@@ -27,13 +27,14 @@ struct FocusResult {
 /** The intermediate raster of a job. */
 inline std::string compressed_raster(const FocusJob& job) { return job.image + ".rc"; }
 
-/** Focuses stripmap data: range compression of whole lines into an intermediate raster "<image>.rc", then azimuth
- * focusing of that in blocks which overlap. The image is in slant range and zero-Doppler time, on the grid of the
- * raw data; a target of amplitude 1 in the raw data has amplitude 1 in the image, and the phase -4 pi R / lambda.
+/** Focuses stripmap data: range compression of whole lines into an intermediate raster "<image>.rc" or, with
+ * `Flag_incore`, into memory, then azimuth focusing of that in blocks which overlap. The image is in slant range
+ * and zero-Doppler time, on the grid of the raw data; a target of amplitude 1 in the raw data has amplitude 1 in
+ * the image, and the phase -4 pi R / lambda.
  *
  * Of AzimuthConf the bandwidths, Hamming parameters, block sizes and overlaps are taken; overlaps are the least
- * ones, a block's range overlap standing on both of its sides. Of generalProcessingConf `Memory` bounds the block,
- * and `EraseTemp` removes the intermediate raster. Throws Failure. */
+ * ones, a block's range overlap standing on both of its sides. Of generalProcessingConf `Memory` bounds the block
+ * and what is kept in memory, and `EraseTemp` removes the intermediate raster. Throws Failure. */
 FocusResult focus(const FocusJob& job, const AzimuthConf& azimuth, const generalProcessingConf& processing);
 
 }  // namespace example

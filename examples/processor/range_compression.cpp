@@ -38,7 +38,7 @@ RangeCompression::RangeCompression(const SARPulse_Obj& pulse, const AzimuthConf&
 void RangeCompression::prepare_filter(const std::vector<fcomplex>& replica, const SARPulse_Obj& pulse,
                                       const AzimuthConf& conf) {
     const int length = filter_.samples();
-    std::copy(replica.begin(), replica.end(), filter_.data());
+    std::fill(std::copy(replica.begin(), replica.end(), filter_.data()), filter_.data() + length, fcomplex{});
     Transform{1, length, +1, 0}.run(filter_);
 
     const auto hamming = static_cast<double>(conf.RangeWindowHammingParameter);

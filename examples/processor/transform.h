@@ -9,14 +9,15 @@
 
 namespace example {
 
-/** A block of samples that transforms run in, aligned for them. */
+/** A block of samples that transforms run in, aligned for them. They are whatever the memory held: who fills them
+ * first, on its own thread, has the memory near. */
 class Block {
 public:
     Block(int lines, int samples)
         : lines_{lines},
           samples_{samples},
-          data_{static_cast<fcomplex*>(
-              fft_calloc(static_cast<std::size_t>(lines) * static_cast<std::size_t>(samples), sizeof(fcomplex)))} {
+          data_{static_cast<fcomplex*>(fft_malloc(static_cast<std::size_t>(lines) *
+                                                  static_cast<std::size_t>(samples) * sizeof(fcomplex)))} {
         if (!data_) throw Failure{"no memory for a block"};
     }
     [[nodiscard]] int lines() const { return lines_; }

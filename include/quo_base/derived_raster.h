@@ -39,7 +39,7 @@ QUO_BASE_API int read_image_grid(const char* header, const GeneralSAR& product, 
  *
  * All sections of that header are taken over, and those that place the raster are made to fit: "ImageGrid" (made
  * of the region where the other header has none, so that every pixel keeps its times), "ROI", sampling rates that
- * are the image's own, and corner points that the orbit gives. A header
+ * are the image's own, and corner points, which the orbit gives of the corner pixels. A header
  * that stood at the raster's place is replaced.
  * @param raster  its description is the new raster's
  * @param header  header of the other raster; it may be the new one's own place

@@ -42,8 +42,9 @@ struct ImageTimes {
 /** What is wanted of them; null where it is not. Times without a pixel get not-a-number. Lines and samples may lie
  * outside the raster: whoever has the raster knows its size. */
 struct TimePixels {
-    double* line{};          ///< lines; of a point that two bursts see, the earlier burst's
-    double* second_line{};   ///< the line in the later burst; not-a-number where one burst sees the point
+    /** Lines; of a point that two bursts see, the earlier burst's, unless the raster begins behind it. */
+    double* line{};
+    double* second_line{};   ///< the line in a burst later than that; not-a-number where there is none
     double* sample{};        ///< samples
     std::int32_t* status{};  ///< 0; 1 for times that are not finite, lie in no burst or on no ground range
 };

@@ -18,7 +18,8 @@ typedef struct quo_import_request {
     const char* orbit_file;   /**< state vectors in place of the annotation's; of the same satellite and time */
     int link; /**< 1: the raster becomes a link to samples that stand in the measurement as they are,
                    and they are not copied */
-    /** Told of every block of lines; anything but 0 ends the import, with 1. Null: nobody is. */
+    /** Told of the bytes of the raster that are written, and of all, every 16 MB or oftener; anything but 0 ends
+     * the import, with 1. Null: nobody is. A link has no bytes to tell of. */
     int (*progress)(void* context, int64_t done, int64_t all);
     void* context; /**< handed to progress */
 } quo_import_request;
@@ -51,13 +52,14 @@ typedef struct quo_import_result {
  * the unsigned 16-bit samples of detected products become INT32. Raster and header appear together, or nothing
  * does; an older header of that name keeps the sections that the product has not.
  *
- * An image of one swath gets its antenna pattern beside it, in a raster of the name and ".antenna".
+ * An image of one swath gets its antenna pattern beside it, in a raster of the name and ".antenna"; of another
+ * image, one that an older import left there is removed.
  *
  * @param[in]  request  what to do
  * @param[out] result   filled in any case
- * @return 0; 1 for a null, a product that is none of the mission's or lacks something, an orbit file that does not
- *         fit, or samples that cannot be linked; 4 for a measurement that is cut short; 5, 7, 9. The reason is in
- *         the report too. The antenna pattern follows when raster and header are in place: where it alone
+ * @return 0; 1 for a null, a product that is none of the mission's or lacks something, an orbit that does not fit
+ * or does not see the image, or samples that cannot be linked; 4 for a measurement that is cut short; 5, 7, 9. The
+ * reason is in the report too. The antenna pattern follows when raster and header are in place: where it alone
  *         cannot be written, the call says so, and they stay. */
 QUO_BASE_API int quo_import_sentinel1(const quo_import_request* request, quo_import_result* result) QUO_NOEXCEPT;
 

@@ -54,7 +54,8 @@ QUO_BASE_API int quo_product_close(quo_product* product) QUO_NOEXCEPT;
 
 /* ---- Values ----
  *
- * 1 also for a field that the product does not have. */
+ * 1 also for a field that the product does not have. Fields of "ImageGrid" are those of the grid that places the
+ * pixels, which a header without that section has of its region. */
 
 /** How many values a field has: 1 for a text, 0 for an array that the product does not fill. */
 QUO_BASE_API int quo_product_length(const quo_product* product, const char* field, size_t* length) QUO_NOEXCEPT;
@@ -158,8 +159,9 @@ QUO_BASE_API int quo_product_pixels_to_times(const quo_product* product, size_t 
  * @param[in]  product        whose pixels
  * @param[in]  count          number of times
  * @param[in]  azimuth_s, range_s  the times
- * @param[out] line, sample   the pixels; of what two bursts see, the earlier burst's
- * @param[out] later_line     the later burst's line; not-a-number where one burst alone sees it
+ * @param[out] line, sample   the pixels; of what two bursts see, the earlier burst's, unless the raster
+ *                            begins behind it
+ * @param[out] later_line     the line in a burst later than that; not-a-number where there is none
  * @param[out] status         of each: 0; 1 for times that are not finite, or in no burst or on no ground range */
 QUO_BASE_API int quo_product_times_to_pixels(const quo_product* product, size_t count, const double* azimuth_s,
                                              const double* range_s, double* line, double* later_line,

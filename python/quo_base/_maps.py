@@ -3,6 +3,7 @@
 from __future__ import annotations
 
 import os
+from functools import lru_cache
 from typing import Any, NamedTuple, Optional
 
 import numpy as np
@@ -23,10 +24,23 @@ def _horizontal(crs: Any) -> str:
     return (whole.sub_crs_list[0] if whole.is_compound else whole).to_wkt()
 
 
-def _transformer(source: Any, target: Any) -> Any:
+@lru_cache(16)  # making one takes longer than what a small tile asks of it; pyproj keeps them apart for threads
+def _transformer(source: str, target: str) -> Any:
     from pyproj import Transformer
 
     return Transformer.from_crs(source, target, always_xy=True)
+
+
+@lru_cache(2)
+def _to_ellipsoid(geoid: str) -> Any:
+    """From the geoid's heights to the ellipsoid's; refused where the geoid's grid is not installed."""
+    from pyproj.transformer import TransformerGroup
+
+    group = TransformerGroup(geoid, "EPSG:4979", always_xy=True)
+    if not group.transformers or not group.best_available:
+        missing = ", ".join(grid.short_name for op in group.unavailable_operations for grid in op.grids)
+        raise ValueError(f"heights above {geoid} need a geoid grid that is not installed: {missing}")
+    return group.transformers[0]
 
 
 class Terrain(NamedTuple):
@@ -53,20 +67,9 @@ class Terrain(NamedTuple):
                 raise ValueError(f"{path}: its rows do not run along the axes; warp it first")
             crs, transform = _horizontal(file.crs.to_wkt()), tuple(file.transform)[:6]
             made = cls(os.fspath(path), crs, transform, file.shape, file.nodata, geoid)
-        made._to_ellipsoid()
+        if geoid is not None:
+            _to_ellipsoid(geoid)
         return made
-
-    def _to_ellipsoid(self) -> Any:
-        """From the geoid's heights to the ellipsoid's; refused where the geoid's grid is not installed."""
-        from pyproj.transformer import TransformerGroup
-
-        if self.geoid is None:
-            return None
-        group = TransformerGroup(self.geoid, "EPSG:4979", always_xy=True)
-        if not group.transformers or not group.best_available:
-            missing = ", ".join(grid.short_name for op in group.unavailable_operations for grid in op.grids)
-            raise ValueError(f"heights above {self.geoid} need a geoid grid that is not installed: {missing}")
-        return group.transformers[0]
 
     def heights(self, longitude: np.ndarray, latitude: np.ndarray) -> np.ndarray:
         """Heights above the ellipsoid at places, bilinear; not-a-number beyond the model and beside its gaps."""
@@ -85,8 +88,9 @@ class Terrain(NamedTuple):
         if self.nodata is not None:
             block[block == self.nodata] = np.nan
         made = _bilinear(block, row - first_row, column - first_column)
-        geoid = self._to_ellipsoid()
-        return made if geoid is None else geoid.transform(longitude, latitude, made)[2]
+        if self.geoid is None:
+            return made
+        return _to_ellipsoid(self.geoid).transform(longitude, latitude, made)[2]
 
 
 def _geoid_of(path: Any, crs: Any, heights: Optional[str]) -> Optional[str]:

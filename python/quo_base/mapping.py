@@ -3,6 +3,7 @@
 from __future__ import annotations
 
 import os
+from importlib.util import find_spec
 from typing import Any, NamedTuple, Optional, Sequence, Union
 
 import numpy as np
@@ -36,6 +37,7 @@ class _Job(NamedTuple):
     """All that a tile of the map is made of: paths and numbers, so that it travels to other machines."""
 
     header: str
+    raster: str
     terrain: Terrain
     grid: MapGrid
     resampling: str
@@ -43,7 +45,7 @@ class _Job(NamedTuple):
 
     def tile(self, row: int, column: int, rows: int, columns: int) -> dict[str, np.ndarray]:
         """Those quantities on rows x columns of the map from a place on."""
-        product = Product(self.header)
+        product = Product(self.header, self.raster)
         return _Tile(self, product, row, column, rows, columns).quantities()
 
 
@@ -150,26 +152,37 @@ def geocode(
 ) -> Any:
     """The product's image as a map: an xarray.Dataset with one variable for each quantity.
 
-    dem: elevation model, any file that rasterio reads. heights: what its heights stand on, "ellipsoid" (WGS84),
-    "egm96" or "egm2008"; unless told, what the file names, and one that names nothing is refused. Geoid heights are
-    converted by pyproj, or refused where its grids are missing. crs and
-    spacing (in units of crs): the map's reference system and pixels; unless given those of the elevation model.
+    product: as its file has it, so that what was changed is saved before. dem: elevation model, any file that
+    rasterio reads. heights: what its heights stand on, "ellipsoid" (WGS84), "egm96" or "egm2008"; unless told, what
+    the file names, and one that names nothing is refused. Geoid heights are converted by pyproj, or refused where
+    its grids are missing. crs and spacing (in units of crs): the map's reference system and pixels; unless given
+    those of the elevation model.
     The map covers the model as far as the image may reach. resampling: "nearest", "bilinear" or "sinc" (eight
     samples each way). quantities: see QUANTITIES. chunks: pixels of a tile's side; then the variables are dask
     arrays of tiles that are made when they are asked for, on any scheduler. Not-a-number where there is no image.
 
     Amplitudes of complex images are interpolated, not the samples: their phase turns too fast for a neighbour's.
     """
-    _check(resampling, quantities)
+    _need("xarray", "rasterio", "pyproj", *(["dask"] if chunks is not None else []))
+    _check(resampling, quantities, chunks)
     held = product if isinstance(product, Product) else Product(product)
     if held.path is None:
         raise ValueError("a product in memory has no raster to map")
     terrain = Terrain.of(dem, heights)
-    job = _Job(held.path, terrain, MapGrid.over(held, terrain, crs, spacing), resampling, tuple(quantities))
+    grid = MapGrid.over(held, terrain, crs, spacing)
+    job = _Job(held.path, held.raster.path, terrain, grid, resampling, tuple(quantities))
     return _dataset(job, _eager(job) if chunks is None else _lazy(job, chunks))
 
 
-def _check(resampling: str, quantities: Sequence[str]) -> None:
+def _need(*modules: str) -> None:
+    for module in modules:
+        if find_spec(module) is None:
+            raise ModuleNotFoundError(f"geocode() needs {module}, Debian's python3-{module}", name=module)
+
+
+def _check(resampling: str, quantities: Sequence[str], chunks: Optional[int]) -> None:
+    if chunks is not None and chunks < 1:
+        raise ValueError(f"tiles of {chunks} pixels make no map")
     if resampling not in _maps.RESAMPLINGS:
         raise ValueError(f"resampling is one of {', '.join(_maps.RESAMPLINGS)}, not {resampling!r}")
     unknown = [name for name in quantities if name not in QUANTITIES]

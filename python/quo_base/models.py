@@ -7,6 +7,7 @@ from typing import Any, ClassVar, NamedTuple, Union
 
 from . import _core
 from ._arrays import broadcast, plain
+from ._paths import file_name
 from .product import Section
 from .times import to_seconds
 
@@ -58,11 +59,11 @@ class Region(_Model):
     @classmethod
     def read(cls, path: Path, section: str = "ROI") -> Region:
         """The region of a section of a header or parameter file."""
-        return cls._of(_core.Region.read(os.fspath(path), section))
+        return cls._of(_core.Region.read(file_name(path), section))
 
     def save(self, path: Path, section: str = "ROI") -> None:
         """Writes the region as a section of a header, replacing an older one."""
-        self._header.write(os.fspath(path), section)
+        self._header.write(file_name(path), section)
 
     def __and__(self, other: Region) -> Region:
         """What two regions share, on this one's grid."""
@@ -88,11 +89,11 @@ class Polynomial(_Model):
     @classmethod
     def read(cls, path: Path, name: str) -> Polynomial:
         """The polynomial of a name such as "DopplerCentroid-0" of a header."""
-        return cls._of(_core.Polynomial.read(os.fspath(path), name))
+        return cls._of(_core.Polynomial.read(file_name(path), name))
 
     def save(self, path: Path, name: str) -> None:
         """Writes the polynomial under a name into a header."""
-        self._header.write(os.fspath(path), name)
+        self._header.write(file_name(path), name)
 
     def __call__(self, range_time: Any, azimuth_time: Any) -> Any:
         """Values at range times (two-way, s) and azimuth times."""
@@ -109,11 +110,11 @@ class Coregistration(_Model):
     @classmethod
     def read(cls, path: Path) -> Coregistration:
         """The mapping of a header or parameter file."""
-        return cls._of(_core.Coregistration.read(os.fspath(path)))
+        return cls._of(_core.Coregistration.read(file_name(path)))
 
     def save(self, path: Path) -> None:
         """Writes the mapping into a header."""
-        self._header.write(os.fspath(path))
+        self._header.write(file_name(path))
 
     def to_slave(self, range_time: Any, azimuth_time: Any) -> tuple[Any, Any]:
         """Range and azimuth times of the slave, s."""
@@ -152,12 +153,12 @@ class Configuration(Section):
     def read(cls, path: Path, name: str, channel: int = 1) -> Configuration:
         """The record of a configuration file."""
         made = cls.__new__(cls)
-        Section.__init__(made, _core.Configuration.read(name, os.fspath(path), channel), name)
+        Section.__init__(made, _core.Configuration.read(name, file_name(path), channel), name)
         return made
 
     def save(self, path: Path, channel: int = 1) -> None:
         """Writes the record's own parameters into a configuration file."""
-        self._header.write(os.fspath(path), channel)
+        self._header.write(file_name(path), channel)
 
     @property
     def shared(self) -> dict[str, Any]:
@@ -194,5 +195,5 @@ class Review(NamedTuple):
 
 def review(path: Path, channel: int = 1) -> Review:
     """Compares a configuration file with the records that it holds."""
-    records, findings = _core.review(os.fspath(path), channel)
+    records, findings = _core.review(file_name(path), channel)
     return Review(records, [Finding(*finding) for finding in findings])

@@ -9,6 +9,7 @@ from typing import Any, Union
 import numpy as np
 
 from . import _core
+from ._paths import file_name
 
 __all__ = ["ParameterFile"]
 
@@ -23,7 +24,7 @@ class ParameterFile:
     """
 
     def __init__(self, path: Union[str, os.PathLike]) -> None:
-        self.path = os.fspath(path)
+        self.path = file_name(path)
 
     def __repr__(self) -> str:
         return f"<ParameterFile {self.path}>"

@@ -10,6 +10,7 @@ import numpy as np
 
 from . import _core
 from ._arrays import broadcast, plain
+from ._paths import file_name
 from .orbit import Orbit
 from .raster import Raster
 from .times import to_seconds
@@ -203,8 +204,8 @@ class Product(Mapping):
 
         raster: the raster's file, where it is another than the header's less its last four characters.
         """
-        self._set("_path", None if path is None else os.fspath(path))
-        self._set("_raster", None if raster is None else os.fspath(raster))
+        self._set("_path", None if path is None else file_name(path))
+        self._set("_raster", None if raster is None else file_name(raster))
         self._set("_header", _core.Header() if path is None else _core.Header.read(self._path))
 
     def _set(self, name: str, value: Any) -> None:
@@ -245,6 +246,8 @@ class Product(Mapping):
 
     def __setattr__(self, name: str, value: Any) -> None:
         if name == "orbit":
+            if not isinstance(value, Orbit):
+                raise TypeError("an Orbit is needed")
             self._header.set_orbit(value._orbit)
         else:
             raise AttributeError(f"{name} cannot be set; sections are added by add()")
@@ -294,7 +297,7 @@ class Product(Mapping):
         exact: numbers with all their digits; else with the 15 that headers usually have. The old file stays whole
         where this fails.
         """
-        target = self._path if path is None else os.fspath(path)
+        target = self._path if path is None else file_name(path)
         if target is None:
             raise TypeError("a product in memory needs a file name")
         self._header.write(target, exact)

@@ -11,6 +11,7 @@ import numpy as np
 
 from . import _core
 from ._arrays import contiguous
+from ._paths import file_name
 
 __all__ = ["Raster", "RasterWriter"]
 
@@ -114,8 +115,8 @@ class Raster:
         """
         if path is None and header is None:
             raise TypeError("a raster's file or a header is needed")
-        self._path = None if path is None else os.fspath(path)
-        self._header = f"{self._path}.hdr" if header is None else os.fspath(header)
+        self._path = None if path is None else file_name(path)
+        self._header = f"{self._path}.hdr" if header is None else file_name(header)
         self._wanted = None if dtype is None else np.dtype(dtype)
         if dtype is not None:
             _cell_type(dtype)
@@ -176,6 +177,8 @@ class Raster:
     def read_into(self, out: np.ndarray, first_line: int = 0, first_sample: int = 0) -> np.ndarray:
         """Fills an array (lines, samples) of any type of samples, C-contiguous and writable, with the block that
         begins there, and returns it: nothing is allocated or copied."""
+        if not isinstance(out, np.ndarray):
+            raise TypeError("an array is needed")
         if out.ndim != 2 or not out.dtype.isnative:
             raise ValueError("an array of two dimensions in the machine's byte order is needed")
         self._reader.read(first_line, out.shape[0], first_sample, out.shape[1], _cell_type(out.dtype), out)
@@ -214,7 +217,7 @@ class RasterWriter:
         """shape: lines, samples of a line; byte_order: "little" or "big"; row_prefix: bytes before each line."""
         if byte_order not in ("little", "big"):
             raise ValueError('the byte order is "little" or "big"')
-        self.path = os.fspath(path)
+        self.path = file_name(path)
         self.shape = (operator.index(shape[0]), operator.index(shape[1]))
         self.dtype = _STORED[_cell_type(dtype)].newbyteorder(">" if byte_order == "big" else "<")
         self._writer = _core.RasterWriter(

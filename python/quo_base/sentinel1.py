@@ -6,6 +6,7 @@ import os
 from typing import Callable, NamedTuple, Optional, Union
 
 from . import _core
+from ._paths import file_name
 from .product import Product
 
 __all__ = ["Imported", "TiePoints", "import_product"]
@@ -57,11 +58,11 @@ def import_product(
 
     source: the product's folder, manifest or annotation; swath ("IW1") and polarization ("VV") where it has
     several; orbit_file: state vectors in place of the annotation's; link: do not copy samples that can be used as
-    they stand; progress: told of blocks done and of all; what it raises ends the import.
+    they stand; progress: told of bytes written and of all; what it raises ends the import.
     """
-    orbit = None if orbit_file is None else os.fspath(orbit_file)
-    name = os.fspath(raster)
+    orbit = None if orbit_file is None else file_name(orbit_file)
+    name = file_name(raster)
     _, _, linked, *ties = _core.import_sentinel1(
-        os.fspath(source), name, swath, polarization, orbit, link, progress
+        file_name(source), name, swath, polarization, orbit, link, progress
     )
     return Imported(Product(name + ".hdr"), linked, TiePoints(*ties))

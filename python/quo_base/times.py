@@ -11,6 +11,7 @@ from . import _core
 __all__ = ["to_datetime64", "to_seconds", "to_text"]
 
 _EPOCH = np.datetime64("1985-01-01T00:00:00", "ns")
+_REACH_S = 8.7e9  # into 1709 and 2260; 64 bits of nanoseconds end in 2262
 _SECOND = np.timedelta64(1, "s")
 _NANOSECOND = np.timedelta64(1, "ns")
 
@@ -35,9 +36,9 @@ def to_seconds(times: Any) -> Any:
 
 
 def to_datetime64(seconds: Any) -> Any:
-    """datetime64[ns] of seconds since 1985; not-a-number and infinities become not-a-time."""
+    """datetime64[ns] of seconds since 1985; not-a-number and what lies beyond its years become not-a-time."""
     values = np.asarray(seconds, dtype=np.float64)
-    known = np.isfinite(values)
+    known = np.abs(values) < _REACH_S
     whole = np.floor(np.where(known, values, 0.0))
     rest = np.rint((np.where(known, values, 0.0) - whole) * 1e9)
     times = _EPOCH + whole.astype(np.int64) * _SECOND + rest.astype(np.int64) * _NANOSECOND

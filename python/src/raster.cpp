@@ -96,6 +96,7 @@ public:
         file_.ByteOrder = big_endian ? 1 : 0;
         if (file_.rasterSize() < 0) raise(QUO_REFUSED, "the description makes no raster");
         run_on_file("creating a raster", [&] { return file_.create(); });
+        created_ = true;
     }
 
     /** Writes samples that are in the file's own type and byte order. */
@@ -121,16 +122,17 @@ private:
     /** One thread at a time; the file itself knows what the system refused it. */
     template <typename Call>
     void run_on_file(const char* doing, Call call) {
+        bool gone = false;
         Failure failure = attempt([&] {
             const std::lock_guard guard{writing_};
-            return call();
+            gone = created_ && !file_.is_open();
+            return gone ? int{QUO_REFUSED} : call();
         });
         if (failure.status == QUO_OK) return;
         failure.system_error = file_.systemError();
-        raise(failure, doing);
+        raise(failure, gone ? "the raster is complete or given up" : doing);
     }
     int write_lines(const Block& block, const char* samples) {
-        if (!file_.is_open()) return QUO_REFUSED;
         const std::int64_t size = file_.pixelsizeof(), row = file_.getSamples() * size + file_.getRowPrefix();
         const std::int64_t bytes = block.samples * size;
         for (int i = 0; i < block.lines; ++i) {
@@ -152,6 +154,7 @@ private:
     }
 
     BufferFile file_;
+    bool created_ = false;
     std::mutex writing_;
 };
 

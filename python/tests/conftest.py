@@ -1,6 +1,8 @@
 """What the tests share: the bundled scenes and their tie points."""
 
 import os
+import shutil
+import struct
 from pathlib import Path
 
 import numpy as np
@@ -32,3 +34,27 @@ def write_model(path, heights, corner, step, crs="EPSG:4326"):
     with rasterio.open(path, "w", driver="GTiff", crs=crs, transform=transform, **shape) as file:
         file.write(heights.astype(np.float32), 1)
     return path
+
+
+def write_sparse_tiff(path, lines, samples, complex_samples):
+    """Integers of 16 bits, in pairs or alone, in one strip, all zero and none of them on the disk."""
+    size, kind = lines * samples * (4 if complex_samples else 2), 5 if complex_samples else 1
+    bits = 32 if complex_samples else 16
+    tags = [(256, samples), (257, lines), (258, bits), (259, 1), (262, 1), (273, 8), (277, 1), (278, lines), (279, size)]
+    tags.append((339, kind))
+    with open(path, "wb") as file:
+        file.write(struct.pack("<2sHI", b"II", 42, 8 + size))
+        file.seek(8 + size)
+        file.write(struct.pack("<H", len(tags)))
+        file.write(b"".join(struct.pack("<HHII", tag, 4, 1, value) for tag, value in tags) + bytes(4))
+
+
+def copy_of_safe(name, folder, lines, samples, stated_samples):
+    """A bundled product in a folder, with a measurement of fewer samples than its annotation states, and the text of it."""
+    shutil.copytree(DATA / "sentinel1" / name, folder / name)
+    annotation = next((folder / name / "annotation").iterdir())
+    text = annotation.read_text()
+    annotation.write_text(text.replace(f"<numberOfSamples>{stated_samples}<", f"<numberOfSamples>{samples}<"))
+    (folder / name / "measurement").mkdir(exist_ok=True)
+    write_sparse_tiff(folder / name / "measurement" / (annotation.stem + ".tiff"), lines, samples, "SLC" in name)
+    return folder / name, text

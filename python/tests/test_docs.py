@@ -1,28 +1,55 @@
 import re
-from pathlib import Path
 
 import numpy as np
+import pytest
 from conftest import DATA, write_model
 from quo_base import Product, RasterWriter
 
-PAGE = DATA.parent.parent / "docs" / "python.md"
+ROOT = DATA.parent.parent
+LINES, SAMPLES = 400, 1000
 
 
-def test_the_examples_of_the_page_run(scene_file, tmp_path, monkeypatch):
-    monkeypatch.chdir(tmp_path)
-    samples = np.arange(200 * 300).reshape(200, 300).astype("c8")
-    with RasterWriter(Path("scene"), samples.shape, "c8") as image:
-        image[:] = samples
+def make_scene(scene_file):
+    """A product scene.hdr of speckle through which parallels and meridians run at every hundredth of a degree, and a
+    model of flat ground in it, dem.tif; its samples."""
     product = Product(scene_file)
+    product.ROI.update(Lines=LINES, Samples=SAMPLES)
+    times = product.grid.times(np.arange(LINES)[:, np.newaxis], np.arange(SAMPLES))
+    seen = product.orbit.to_ground(times.azimuth_time, times.range_time)
+    off = [np.abs(each / 0.01 - np.rint(each / 0.01)) for each in seen[:2]]
+    speckle = np.random.default_rng(3).normal(size=(LINES, SAMPLES, 2)).astype("f4").view("c8")[..., 0]
+    samples = speckle * (1 + 9 * (np.minimum(*off) < 0.03)).astype("f4")
+    with RasterWriter("scene", samples.shape, "c8") as image:
+        image[:] = samples
     product.add("RasterInfo", **Product("scene.hdr").RasterInfo)
-    product.ROI.update(Lines=200, Samples=300)
     product.save("scene.hdr")
-    times = product.grid.times(100, 150)
-    middle = product.orbit.to_ground(times.azimuth_time, times.range_time)
-    write_model("dem.tif", np.zeros((40, 80)), (middle.longitude - 0.004, middle.latitude + 0.002), 1e-4)
+    middle = [float(each[LINES // 2, SAMPLES // 2]) for each in seen[:2]]
+    write_model("dem.tif", np.zeros((300, 300)), (middle[1] - 0.015, middle[0] + 0.015), 1e-4)
+    return samples
+
+
+def test_the_examples_of_the_page_run(scene_file, tmp_path, monkeypatch, capsys):
+    rasterio = pytest.importorskip("rasterio")
+    for module in ("pyproj", "matplotlib", "distributed"):
+        pytest.importorskip(module)
+    monkeypatch.chdir(tmp_path)
+    samples = make_scene(scene_file)
     names: dict = {}
-    for block in re.findall(r"```python\n(.*?)```", PAGE.read_text(), re.DOTALL):
+    for block in re.findall(r"```python\n(.*?)```", (ROOT / "docs" / "python.md").read_text(), re.DOTALL):
         exec(block, names)
     assert np.array_equal(names["block"], samples[100:150, ::2]) and names["seen"].status.sum() == 0
-    assert names["scene_map"]["image"].shape == (40, 80) and [each.state for each in names["outcomes"]] == ["made"]
-    assert names["power"].shape == (200,) and names["fit"].rank == 3
+    assert names["scene_map"]["image"].shape == (300, 300) and [each.state for each in names["outcomes"]] == ["made"]
+    assert names["power"].shape == (LINES,) and names["fit"].rank == 3 and (tmp_path / "maps.png").stat().st_size > 1e4
+    monkeypatch.syspath_prepend(ROOT / "examples" / "python")
+    import geolocate
+    import line_profile
+    import maps_on_workers
+
+    capsys.readouterr()
+    geolocate.main("scene.hdr")
+    line_profile.main("scene.hdr", "64")
+    told = capsys.readouterr().out
+    assert told.count("incidence") == 5 and f"{LINES} lines, mean power {np.mean(np.abs(samples) ** 2):.4g}"[:-1] in told
+    maps_on_workers.make_map("map.tif", "scene.hdr", "dem.tif")
+    with rasterio.open("map.tif") as file:
+        assert np.array_equal(file.read(1), names["scene_map"].image, equal_nan=True)

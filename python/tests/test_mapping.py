@@ -2,12 +2,15 @@
 
 import os
 import pickle
+import re
+import sys
+import tracemalloc
 
 import numpy as np
 import pytest
 import quo_base
-from conftest import DATA, SCENES, write_model
-from quo_base import Job, Product, geocode, run
+from conftest import DATA, SCENES, copy_of_safe, write_model
+from quo_base import Job, Product, geocode, run, sentinel1
 
 rasterio = pytest.importorskip("rasterio")
 pyproj = pytest.importorskip("pyproj")
@@ -91,13 +94,65 @@ def test_heights_of_a_geoid_are_converted_or_refused_and_never_mixed(product, fl
     with pytest.raises(ValueError, match="no place in common"):
         far = write_model(tmp_path / "far.tif", np.zeros((9, 9)), (150.0, 10.0), 1e-3)
         geocode(product, far, heights="ellipsoid")
-    for wrong in ({"resampling": "cubic"}, {"quantities": []}, {"quantities": ["height", "slope"]}, {"heights": "sea"}, {"spacing": -1.0}):
+    for wrong in ({"resampling": "cubic"}, {"quantities": []}, {"quantities": ["height", "slope"]}, {"heights": "sea"}, {"spacing": -1.0}, {"chunks": 0}):
         with pytest.raises(ValueError):
             geocode(product, flat, **{"heights": "ellipsoid", **wrong})
+    with pytest.MonkeyPatch.context() as absent, pytest.raises(ModuleNotFoundError, match="python3-pyproj"):
+        absent.setitem(sys.modules, "pyproj", None)
+        geocode(product, flat, heights="ellipsoid")
     with rasterio.open(flat, "r+") as file:
         file.transform = rasterio.Affine(1e-4, 2e-5, file.transform.c, 2e-5, -1e-4, file.transform.f)
     with pytest.raises(ValueError, match="along the axes"):
         geocode(product, flat, heights="ellipsoid")
+
+
+def test_tie_points_of_a_real_ground_range_image_lie_on_their_pixels(tmp_path):
+    """On slopes that go through each tie point's height: what its producer states, from the whole chain of the map."""
+    name = "S1B_IW_GRDH_1SDV_20211223T051122_20211223T051147_030148_039993_5371.SAFE"
+    folder, annotation = copy_of_safe(name, tmp_path, 16705, 30, 26102)
+    product = sentinel1.import_product(folder, tmp_path / "image").product
+    product.RasterInfo.NrOfPixelsPerLine = 26102  # no samples are read
+    product.save(exact=True)
+    tags = ("line", "pixel", "latitude", "longitude", "height")
+    stated = np.array([re.findall(f"<{tag}>([0-9.e+-]+)</{tag}>", annotation)[-20:] for tag in tags], float).T
+    slope = np.add.outer(np.arange(-4, 5), 2 * np.arange(-4, 5))
+    for line, sample, latitude, longitude, height in stated:
+        corner = (longitude - 4.5e-4, latitude + 4.5e-4)
+        model = write_model(tmp_path / "slope.tif", height + slope, corner, 1e-4)
+        made = geocode(product, model, quantities=["line", "sample"], heights="ellipsoid")
+        here = made.sel(x=longitude, y=latitude, method="nearest")
+        assert (float(here["line"]), float(here["sample"])) == pytest.approx((line, sample), abs=0.02)
+
+
+def test_memory_is_that_of_a_tile_not_of_the_map(product, flat):
+    def peak(chunks):
+        tracemalloc.start()
+        geocode(product, flat, heights="ellipsoid", chunks=chunks).image.mean().compute(scheduler="synchronous")
+        held = tracemalloc.get_traced_memory()[1]
+        tracemalloc.stop()
+        return held
+
+    peak(400)  # loads modules
+    assert peak(50) < 0.4 * peak(400)
+
+
+def test_files_and_clusters_that_go_are_told(product, flat, tmp_path):
+    copy = str(tmp_path / "copy.hdr")
+    Product(product.path).save(copy)
+    tiles = geocode(Product(copy, raster=product.path[:-4]), flat, heights="ellipsoid", chunks=64)
+    assert tiles.image.mean().compute(scheduler="synchronous") == pytest.approx(1, abs=0.5)
+    os.remove(flat)
+    with pytest.raises(rasterio.errors.RasterioIOError, match="flat.tif"):
+        tiles.compute(scheduler="synchronous")
+    os.remove(copy)
+    with pytest.raises(quo_base.Error, match="copy.hdr"):
+        tiles.compute(scheduler="synchronous")
+    distributed = pytest.importorskip("distributed")
+    with distributed.Client(processes=False, n_workers=1, dashboard_address=None) as client:
+        pass
+    with pytest.raises(Exception, match="client|Client|losed"):
+        run([Job(str(tmp_path / "none"), _write, ("text",))], client, progress=None)
+    assert os.listdir(tmp_path) == []
 
 
 def _write(path, text, fail_once=None):
@@ -133,7 +188,7 @@ def test_a_killed_worker_leaves_nothing_half(tmp_path, product, flat):
     jobs = [Job(str(tmp_path / str(i)), _write, (str(i),)) for i in range(6)]
     jobs.append(Job(str(tmp_path / "killed"), _kill_once, (str(tmp_path / "mark"),)))
     whole = geocode(product, flat, heights="ellipsoid").image.values
-    with distributed.LocalCluster(2, threads_per_worker=1, dashboard_address=None) as cluster:
+    with distributed.LocalCluster(n_workers=2, threads_per_worker=1, dashboard_address=None) as cluster:
         with distributed.Client(cluster) as client:
             assert all(outcome.state != "failed" for outcome in run(jobs, client, progress=None))
             tiles = geocode(product, flat, heights="ellipsoid", chunks=100).image.compute()

@@ -89,6 +89,7 @@ def test_times_are_those_of_the_calendar():
     assert (np.abs(times.to_datetime64(seconds) - stamps)[:2] < np.timedelta64(250, "ns")).all()
     assert times.to_seconds("04-JAN-2022 17:05:58.268589") == times.to_seconds("2022-01-04T17:05:58.268589Z")
     assert times.to_text(seconds[1]) == "2022-01-04T17:05:58.268589"
+    assert np.isnat(times.to_datetime64([1e10, -1e10, np.inf])).all()  # no wrap into other centuries
     for text in ("yesterday", "32-JAN-2022"):
         with pytest.raises(ValueError):
             times.to_seconds(text)

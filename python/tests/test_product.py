@@ -1,7 +1,7 @@
 import pickle
 
 import pytest
-from quo_base import Error, FileError, NumericError, Product, Refused
+from quo_base import Error, FileError, NumericError, ParameterFile, Product, RasterWriter, Refused
 
 
 def test_fields_have_one_value_under_all_their_names(scene_file):
@@ -41,6 +41,8 @@ def test_lengths_and_arrays_stay_together(scene_file):
         with pytest.raises((ValueError, TypeError)):
             vectors.update(fields)
         assert vectors == before
+    with pytest.raises(TypeError, match="Orbit"):
+        product.orbit = 1.0
     with pytest.raises(KeyError):
         product.add("Pulse", Colour=1)
     assert "Pulse" not in product
@@ -82,3 +84,12 @@ def test_failures_tell_status_and_report_entry(scene_file, tmp_path, status, kin
     assert caught.value.system_error == (getattr(caught.value, "errno", None) or 0)
     copy = pickle.loads(pickle.dumps(caught.value))
     assert isinstance(copy, Error) and copy.entry == caught.value.entry
+
+
+@pytest.mark.parametrize("wrong", ["a\0.hdr", "\udcff.hdr", b"\xff", 3])
+def test_names_that_would_be_cut_or_misread_are_refused(scene_file, tmp_path, monkeypatch, wrong):
+    monkeypatch.chdir(tmp_path)
+    for doing in (Product, Product(scene_file).save, ParameterFile, lambda name: RasterWriter(name, (1, 1), "f4")):
+        with pytest.raises((ValueError, TypeError), match="file name|surrogates|os.PathLike"):
+            doing(wrong)
+    assert not list(tmp_path.iterdir())

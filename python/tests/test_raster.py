@@ -87,6 +87,7 @@ def test_threads_share_a_raster(tmp_path):
         (IndexError, lambda raster: raster[0, 0, 0]),
         (TypeError, lambda raster: raster[[0, 1]]),
         (TypeError, lambda raster: raster.astype("u8")),
+        (TypeError, lambda raster: raster.read_into([[0.0]])),
         (TypeError, lambda raster: raster.__setitem__(0, "text")),
         (Refused, lambda raster: raster.__setitem__(0, 1j)),
         (ValueError, lambda raster: raster.__setitem__(0, [1, 2])),
@@ -110,4 +111,7 @@ def test_unfinished_rasters_leave_the_old_one(tmp_path):
     with pytest.raises(FileError):
         with RasterWriter(tmp_path / "image", (2, 2), "f4") as image:
             image[0] = 1.0
+    for doing in (lambda: image.__setitem__(0, 1.0), image.commit):
+        with pytest.raises(Refused, match="complete or given up"):
+            doing()
     assert np.array_equal(Raster(tmp_path / "image"), samples) and len(os.listdir(tmp_path)) == 2

@@ -1,48 +1,17 @@
 import os
-import shutil
-import struct
 
 import numpy as np
 import pytest
-from conftest import DATA, SCENES, tie_points
+from conftest import SCENES, copy_of_safe, tie_points
 from quo_base import FileError, sentinel1
 
 NAME = "S1A_IW_SLC__1SDV_20220104T170557_20220104T170624_041314_04E951_F1F1.SAFE"
 LINES, SAMPLES = 4503, 22694
 
 
-def write_sparse_tiff(path):
-    """Complex 16-bit samples in one strip, all zero and none of them on the disk."""
-    size = LINES * SAMPLES * 4
-    tags = [
-        (256, SAMPLES),
-        (257, LINES),
-        (258, 32),
-        (259, 1),
-        (262, 1),
-        (273, 8),
-        (277, 1),
-        (278, LINES),
-        (279, size),
-    ]
-    tags.append((339, 5))
-    with open(path, "wb") as file:
-        file.write(struct.pack("<2sHI", b"II", 42, 8 + size))
-        file.seek(8 + size)
-        file.write(
-            struct.pack("<H", len(tags)) + b"".join(struct.pack("<HHII", tag, 4, 1, value) for tag, value in tags)
-        )
-        file.write(struct.pack("<I", 0))
-
-
 @pytest.fixture
 def safe(tmp_path):
-    folder = tmp_path / NAME
-    shutil.copytree(DATA / "sentinel1" / NAME, folder)
-    annotation = next((folder / "annotation").iterdir())
-    (folder / "measurement").mkdir(exist_ok=True)
-    write_sparse_tiff(folder / "measurement" / (annotation.stem + ".tiff"))
-    return folder
+    return copy_of_safe(NAME, tmp_path, LINES, SAMPLES, SAMPLES)[0]
 
 
 def test_an_imported_product_meets_its_tie_points(safe, tmp_path):

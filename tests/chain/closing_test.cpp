@@ -155,6 +155,15 @@ TEST_F(SmallRaster, DoesNotShowItsBlocks) {
     EXPECT_LT(difference, 1e-3 * power);
 }
 
+// In a raster or in memory, by one thread or three: what stands between the two steps changes no bit of the image.
+TEST_F(SmallRaster, IsTheSameWithItsDataInMemory) {
+    focus("by_raster");
+    processing_.Flag_incore = 1;
+    example::focus({echoes_.raster, folder_.file("in_core"), 0.0, false, 3}, azimuth_, processing_);
+    EXPECT_EQ(test::read_text(folder_.file("in_core")), test::read_text(folder_.file("by_raster")));
+    EXPECT_FALSE(std::filesystem::exists(folder_.file("in_core.rc")));
+}
+
 // Hamming's weights cost resolution, half as much again, and take the sidelobes away. Amplitudes stay.
 TEST_F(SmallRaster, TradesResolutionForSidelobes) {
     azimuth_.AzimuthWindowHammingParameter = azimuth_.RangeWindowHammingParameter = 0.46F;

@@ -255,6 +255,18 @@ TEST(Kernels, GiveTheSameBytesAtEveryWidth) {
     }
 }
 
+TEST(Kernels, StorePastCachesAtAnyPlace) {
+    std::string in(200, ' ');
+    std::iota(in.begin(), in.end(), '\0');
+    for (const auto level : test::processor_levels())
+        for (std::size_t place = 0; place < 33; ++place)
+            for (const std::size_t size : {0, 1, 15, 16, 33, 200}) {
+                std::string out(300, 'x'), expected = out;
+                quo::kernel_table(level).store_past_caches(in.data(), out.data() + place, size);
+                EXPECT_EQ(out, expected.replace(place, size, in, 0, size)) << place << ' ' << size;
+            }
+}
+
 // Lines with room for the pairs keep their place; others grow, so that no sample is lost.
 TEST(BlockWriting, OfComplexIntoFloat64TakesTwoDoublesASample) {
     const test::TemporaryFolder folder;

@@ -100,6 +100,11 @@ TEST(ImageGrid, CutKeepsTheBitsOfEveryTime) {
     ASSERT_EQ(whole.writehdr(report.file("grid.hdr").c_str()), 0);
     ASSERT_EQ(cut.readhdr(report.file("grid.hdr").c_str()), 0);
     ASSERT_EQ(cut.cut(37.0, 111.0, 1.0, 1.0), 0);
+    // In a cut from the second burst on, its first lines are the only ones of what the first burst saw too.
+    ImageGrid_Obj later;
+    ASSERT_EQ(whole.clone(&later) + later.cut(100.0, 0.0, 1.0, 1.0), 0);
+    EXPECT_NEAR(find(later, 10.0, 5.0).line, 10.0, 2e-4);
+    EXPECT_TRUE(std::isnan(find(later, 10.0, 5.0).second));
     EXPECT_EQ(cut.cut(0.0, 0.0, 2.0, 1.0), 1);  // lines of bursts
     EXPECT_EQ(cut.cut(0.0, 0.0, 1.0, 0.0), 1);
     for (const double line : {0.0, 42.0, 150.0}) {

@@ -5,6 +5,7 @@
 #include <cmath>
 #include <cstring>
 #include <filesystem>
+#include <regex>
 #include <string>
 #include <vector>
 
@@ -40,6 +41,12 @@ int import_safe(const std::string& source, const std::string& raster, quo_import
     request.orbit_file = orbit;
     request.link = link ? 1 : 0;
     return quo_import_sentinel1(&request, &result);
+}
+
+std::unique_ptr<quo::MissionProduct> described(const Safe& safe, const std::string& orbit = "") {
+    auto made = std::make_unique<quo::MissionProduct>();
+    quo::describe_sentinel1({safe.annotation().string(), "", ""}, orbit, *made);
+    return made;
 }
 
 // --- Times and tie points ---------------------------------------------------------------------------------------
@@ -79,8 +86,7 @@ TEST_P(Sentinel1Products, AgreeWithTheirTiePointsBothWays) {
     const std::string header = folder.file("scene.hdr");
     {
         // Without the measurement, whose zeros would fill gigabytes.
-        const auto made = std::make_unique<quo::Sentinel1Product>();
-        quo::describe_sentinel1({safe.annotation().string(), "", ""}, "", *made);
+        const auto made = described(safe);
         EXPECT_EQ(made->ties.count, truth.ties);
         EXPECT_LT(made->ties.most_line, truth.most_line);
         EXPECT_LT(made->ties.most_sample, truth.most_sample);
@@ -110,6 +116,20 @@ TEST_P(Sentinel1Products, AgreeWithTheirTiePointsBothWays) {
         for (int i = 0; i < 3; ++i) found[i] = at.point_m[i] - xyz[i];
         ground_off_m = std::max(ground_off_m, std::hypot(found[0], found[1], found[2]));
     }
+    // Tie points at the image's corners, on the ellipsoid: of the first line near, of the last one far.
+    const geoCoords_Obj& corners = product.geoCoords;
+    const struct {
+        const geopoint& found;
+        double latitude_deg, longitude_deg;
+    } kCorners[] = {
+        {truth.grd ? corners.NorthEast : corners.SouthWest, truth.grd ? 42.37675280764677 : 40.94730650708858,
+         truth.grd ? 15.32209672548896 : 11.09455829575940},
+        {truth.grd ? corners.SouthWest : corners.SouthEast, truth.grd ? 41.28078026909404 : 41.10414993861531,
+         truth.grd ? 11.86800305333565 : 12.20787230443543}};
+    for (const auto& [found, latitude_deg, longitude_deg] : kCorners) {
+        EXPECT_NEAR(found.Latitude, latitude_deg, 1e-6);
+        EXPECT_NEAR(found.Longitude, longitude_deg, 1e-6);
+    }
     EXPECT_LT(line_off, truth.most_line);
     EXPECT_LT(sample_off, truth.most_sample);
     EXPECT_LT(ground_off_m, truth.most_ground_m);
@@ -126,10 +146,40 @@ TEST(Sentinel1, DoesWithoutTiePointsInNoBurst) {
     const test::TemporaryFolder folder;
     Safe safe{folder, kSlc};
     safe.change("<line>3002<", "<line>4503<");
-    const auto made = std::make_unique<quo::Sentinel1Product>();
-    quo::describe_sentinel1({safe.annotation().string(), "", ""}, "", *made);
+    const auto made = described(safe);
     EXPECT_EQ(made->ties.count, 10);
     EXPECT_LT(made->ties.most_line, 0.001);
+}
+
+// The tie points are of the annotation's own orbit: another one must not change what they tell of the delay.
+TEST(Sentinel1, KeepsTheDelayUnderAnotherOrbit) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    Safe safe{folder, kSlc};
+    // The minutes of the orbit file's vectors.
+    for (const auto& [from, to] :
+         {std::pair{"17:04", "14:11"}, {"17:05", "14:12"}, {"17:06", "14:13"}, {"17:07", "14:14"}})
+        safe.change(std::string{"2022-01-04T"} + from, std::string{"2023-08-23T"} + to);
+    const auto own = described(safe), other = described(safe, kOrbit);
+    EXPECT_EQ(own->grid.DelayShare, 0.5);
+    EXPECT_EQ(own->grid.DelayReference_s, other->grid.DelayReference_s);
+    EXPECT_NE(own->header.orbit.pSV_m[0], other->header.orbit.pSV_m[0]);
+}
+
+TEST(Sentinel1, TakesFmRatesInTheirOlderForm) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    const Safe safe{folder, kSlc};
+    const auto newer = described(safe);
+    const std::regex list{"<azimuthFmRatePolynomial[^>]*>(\\S+) (\\S+) (\\S+)</azimuthFmRatePolynomial>"};
+    test::write_text(safe.annotation(), std::regex_replace(test::read_text(safe.annotation()), list,
+                                                           "<c0>$1</c0><c1>$2</c1><c2>$3</c2>"));
+    const auto older = described(safe);
+    const polySAR &now = newer->header.polynomials, &then = older->header.polynomials;
+    ASSERT_EQ(now.nfr, then.nfr);
+    ASSERT_EQ(test::read_text(safe.annotation()).find("azimuthFmRatePolynomial"), std::string::npos);
+    EXPECT_LT(now.FR[0].pol[0], -2000.0);
+    for (int i = 0; i < now.nfr; ++i) EXPECT_TRUE(std::ranges::equal(now.FR[i].pol, then.FR[i].pol)) << i;
 }
 
 // --- Modes ------------------------------------------------------------------------------------------------------
@@ -443,6 +493,7 @@ TEST(Sentinel1, RefusesWhatDoesNotFitAndLeavesNothing) {
         {"orbit>", "arc>", "its state vectors make no orbit"},
         {"azimuthFmRatePolynomial count=\"3\">", "azimuthFmRatePolynomial count=\"3\">1 2 3 ",
          "a polynomial with more terms than are known"},
+        {"<slantRangeTime>5.3", "<slantRangeTime>0.3", ".xml: line 2: the orbit does not see the image's corners"},
     };
     for (const auto& [from, to, message] : kChanges) {
         const test::TemporaryFolder folder;
@@ -458,6 +509,57 @@ TEST(Sentinel1, RefusesWhatDoesNotFitAndLeavesNothing) {
         EXPECT_EQ(std::string{result.message}.find('\n'), std::string::npos);
         EXPECT_EQ(std::distance(fs::directory_iterator{folder.path()}, {}), 1) << from;
     }
+}
+
+TEST(Sentinel1, NamesTheFileThatIsDamaged) {
+    const test::Report report;
+    const test::TemporaryFolder folder, other;
+    Safe slc{folder, kSlc}, grd{other, kGrd};
+    slc.shrink(false);
+    write_tiff(slc.measurement(), {"", 32, SAMPLEFORMAT_COMPLEXINT, COMPRESSION_LZW, false, false, 16}, 40, 30,
+               true);
+    test::write_text(slc.measurement(), test::read_text(slc.measurement()).replace(8, 64, 64, '\xff'));
+    quo_import_result result{};
+    EXPECT_EQ(import_safe(slc.path(), folder.file("scene"), result), 4);
+    EXPECT_EQ(result.message, slc.measurement() + ": is cut short or damaged at line 0");
+    grd.change("<numberOfSamples>26102<", "<numberOfSamples>1<");
+    try {
+        (void)described(grd);
+        ADD_FAILURE() << "a conversion of one sample";
+    } catch (const quo::MissionRefusal& refusal) {
+        EXPECT_EQ(refusal.what(), grd.annotation().string() +
+                                      ": line 2: the conversion between slant and ground range has no fit");
+    }
+}
+
+TEST(Sentinel1, LeavesNothingOfAnOlderImportAndTellsItsBytes) {
+    const test::Report report;
+    const test::TemporaryFolder folder, other;
+    Safe slc{folder, kSlc}, grd{other, kGrd};
+    slc.shrink(false);
+    grd.shrink(true);
+    write_tiff(slc.measurement(), kPlain, 40, 30, true);
+    write_tiff(grd.measurement(), kDetected, 40, 30, true);
+    const std::string raster = folder.file("scene"), pattern = raster + ".antenna", source = grd.path();
+    quo_import_result result{};
+    ASSERT_EQ(import_safe(slc.path(), raster, result), 0) << result.message;
+    EXPECT_TRUE(fs::exists(pattern) && fs::exists(pattern + ".hdr"));
+    std::vector<std::int64_t> told;
+    quo_import_request request{};
+    request.source = source.c_str();
+    request.raster = raster.c_str();
+    request.context = &told;
+    request.progress = [](void* context, std::int64_t done, std::int64_t all) {
+        EXPECT_EQ(all, 40 * 30 * 4);
+        static_cast<std::vector<std::int64_t>*>(context)->push_back(done);
+        return 0;
+    };
+    ASSERT_EQ(quo_import_sentinel1(&request, &result), 0) << result.message;
+    EXPECT_EQ(told, (std::vector<std::int64_t>{0, 40 * 30 * 4}));
+    EXPECT_FALSE(fs::exists(pattern) || fs::exists(pattern + ".hdr"));
+    test::write_text(pattern + ".hdr", "notes");  // somebody's own
+    EXPECT_EQ(import_safe(grd.path(), raster, result), 0) << result.message;
+    EXPECT_EQ(test::read_text(pattern + ".hdr"), "notes");
 }
 
 TEST(Sentinel1, NeverReplacesTheProductsOwnFiles) {

@@ -57,6 +57,22 @@ TEST(Runs, FollowTheRule) {
     }
 }
 
+// Points straight aside of the platform: at the time from which they are made.
+TEST(CloseGuess, StopsWithinAHundredthOfASpacing) {
+    const test::Flight flight{{803457.3, 0.1, 1601}};
+    const auto model = quo::OrbitModel::create(1601);
+    ASSERT_EQ(model->build({flight.orbit.pSV_m, flight.orbit.vSV_mOs, 1601, 0.1}, 803457.3), 0);
+    for (const double since_first_s : {0.3, 17.3, 91.7, 158.9})
+        for (const double aside_m : {-6e5, 2e5, 9e5}) {
+            const test::Platform at = flight.state(803457.3 + since_first_s);
+            const Vec3 side = cross(at.velocity, at.position), down = cross(at.velocity, side);
+            const Vec3 p = at.position + aside_m * unit(side) + 7e5 * unit(down);
+            double guess_s = 0.0;
+            ASSERT_TRUE(model->close_guess({{p[0], p[1], p[2]}, 0.0566, 0.0}, &guess_s));
+            EXPECT_NEAR(guess_s, since_first_s, 0.01 * 0.1);
+        }
+}
+
 // The velocities of the list are no part of the model, wherever they come from. Five vectors are one run.
 TEST(Model, PassesThroughItsVectors) {
     test::Flight flight{{803457.3, 9.7, 5}};

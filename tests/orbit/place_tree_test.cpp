@@ -33,6 +33,12 @@ TEST(PlaceTree, FindsTheNearestOfAll) {
                     at = (7e6 + number(7e5)) / norm(at) * at;
             const std::vector<OrbitPlace> in_order = places;
             quo::plant_tree(places);
+            // All that a search from within leaves out it leaves out for this radius: no larger, and hardly
+            // smaller.
+            const double least_m =
+                norm(std::ranges::min(in_order, {}, [](const OrbitPlace& p) { return norm(p.at); }).at);
+            const double told_m = places[places.size() / 2].least_radius_m;
+            ASSERT_TRUE(told_m <= least_m && told_m >= (1.0 - 1e-6) * least_m) << told_m << ' ' << least_m;
             for (int i = 0; i < 100; ++i) {
                 Vec3 point{number(2e7), number(9e6), number(9e6)};
                 if (size.x == 1.0) point = 5.9e6 / norm(point) * point;

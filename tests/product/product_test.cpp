@@ -49,6 +49,15 @@ TEST(Product, TellsEveryValueOfEveryObject) {
     test::fill_product(whole);
     ASSERT_EQ(whole.GSwrite(header.c_str()), 0);
     ASSERT_EQ(read.GSread(header.c_str()), 0);
+    ImageGrid_Obj grid;
+    grid.LineStep_s = 0.0017;
+    grid.FirstSample_s = 0.0053;
+    grid.SampleStep_s = 1.7e-8;
+    grid.LinesPerBurst = 7;
+    grid.Bursts = 3;
+    ASSERT_EQ(grid.createBuffers(), 0);
+    grid.BurstStart_s = {0.25, 0.375, 0.625};
+    ASSERT_EQ(grid.writehdr(header.c_str()), 0);
     const Product product = open_product(header);
     int fields = 0;
     const auto expect_all = [&](const GeneralSAR_BaseXML& object, const std::string& within = "") {
@@ -58,6 +67,7 @@ TEST(Product, TellsEveryValueOfEveryObject) {
     };
     for (int object = gsRoi; object < GeneralSAR::kObjects; ++object)
         expect_all(*read.GSelements(static_cast<GSObject>(object)));
+    expect_all(grid);
     EXPECT_GT(fields, 90);
     for (int i = 0; i < 2; ++i) {
         expect_all(read.polynomials.DC[static_cast<std::size_t>(i)], "DopplerCentroid-" + std::to_string(i) + "/");

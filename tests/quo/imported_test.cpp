@@ -1,6 +1,7 @@
 // What the tool makes of products of a mission, and of one with the lines of a map in it.
 #include <gtest/gtest.h>
 
+#include <array>
 #include <cmath>
 #include <complex>
 #include <cstdlib>
@@ -9,7 +10,7 @@
 #include <string>
 #include <vector>
 
-#include "quo_base/api.h"
+#include "quo_base/image_grid.h"
 #include "support/sentinel1.h"
 #include "tool.h"
 
@@ -87,6 +88,19 @@ TEST_P(Imported, IsRightUntilHeaderAndRasterPart) {
         test::write_text(part + ".hdr", spoilt);
         EXPECT_NE(test::quo({"validate", part}).out.find(finding), std::string::npos) << from;
     }
+    // Its fields are known as those of any other section.
+    for (const char* value : {"word", "-1"})
+        EXPECT_EQ(test::quo({"set", part + ".hdr", "ImageGrid/LineStep_s", value}).exit_status, 2);
+    // All but the geometry is told of a product whose pixel grid is damaged.
+    test::write_text(part + ".hdr", test::replaced(whole, "<LineStep_s>", "<LineStep_s>x"));
+    const auto info = test::quo({"info", part}), vrt = test::quo({"vrt", part});
+    EXPECT_EQ(info.exit_status + vrt.exit_status, 2);
+    EXPECT_NE(info.out.find("objects  "), std::string::npos);
+    EXPECT_EQ(test::read_text(part + ".vrt").find("<GCPList"), std::string::npos);
+    for (const std::string& line : {info.err, vrt.err}) {
+        EXPECT_NE(line.find("part.hdr: section ImageGrid: "), std::string::npos) << line;
+        EXPECT_EQ(std::ranges::count(line, '\n'), 1) << line;
+    }
 }
 
 // The ground makes a jump from burst to burst, and where the conversion to ground range changes: control points on
@@ -105,6 +119,29 @@ TEST_P(Imported, HasControlPointsThatKeepHalfAPixel) {
     EXPECT_LE(most, 0.5);
     const auto last = vrt.rfind("<GCP Id=\"");
     EXPECT_LT(std::stoi(vrt.substr(last + 9)), 1000);
+}
+
+// The same image with every second of its samples: twice the step, in slant range or on the ground.
+TEST_P(Imported, CoregistersWithEverySecondSample) {
+    const std::string half = folder_.file("half.hdr"), whole = test::read_text(header()),
+                      narrow = "<NrOfPixelsPerLine>30<";
+    test::write_text(header(), test::replaced(whole, narrow, "<NrOfPixelsPerLine>20000<"));
+    test::write_text(half, test::replaced(whole, narrow, "<NrOfPixelsPerLine>10000<"));
+    ImageGrid_Obj grid;
+    ASSERT_EQ(grid.readhdr(half.c_str()), 0);
+    ASSERT_EQ(grid.cut(0.0, 0.0, 1.0, 2.0), 0);
+    ASSERT_EQ(grid.writehdr(half.c_str()), 0);
+    const auto run = test::quo({"coregister", header(), half, "-o", folder_.file("REGIST.xml"), "--json"});
+    ASSERT_EQ(run.exit_status, 0) << run.err;
+    const json found = json::parse(run.out);
+    EXPECT_GT(found["points"], 900);
+    const double sample = found["Rg_Samples_Origin"], line = found["Az_Samples_Origin"];
+    for (const auto& [form, expected] : {std::pair{"Rg_Fit_Coeff", std::array{0.0, 0.5, 0.0, 0.5 * sample}},
+                                         std::pair{"Az_Fit_Coeff", std::array{0.0, 0.0, 1.0, line}}}) {
+        constexpr double kFar[] = {1e8, 1e4, 1e4, 1.0};  // what the coefficients are multiplied with there
+        for (std::size_t i = 0; i < expected.size(); ++i)
+            EXPECT_NEAR(found[form][i].get<double>() * kFar[i], expected[i] * kFar[i], 2e-3) << form << i;
+    }
 }
 
 // ---- Items of a catalogue

@@ -143,6 +143,11 @@ TEST_F(RasterVerbs, QuicklookOfOverlappingBurstsIsNoMap) {
         EXPECT_THAT(finished.err, testing::HasSubstr(back == 0 ? "" : "off any affine map"));
         EXPECT_EQ(files().contains("out.pgw"), back == 0);
         std::filesystem::remove(file("out.pgw"));
+        std::filesystem::remove(file("out.png"));
+        std::filesystem::create_directory(file("out.pgw"));  // where no world file can be, there is no picture
+        EXPECT_EQ(test::quo({"quicklook", in, file("out.png"), "--world"}).exit_status, 1);
+        EXPECT_FALSE(files().contains("out.png"));
+        std::filesystem::remove(file("out.pgw"));
     }
 }
 

@@ -9,6 +9,10 @@
 //   ? status          of the exit, where it is not 0
 //   # text            is for the reader
 //
+// Runs the blocks "```console" of pages of the documentation too: a page is one case. There a line that begins
+// with no
+// "$ " is what the command before it writes, and a command goes on after a backslash.
+//
 // In an expected line "..." stands for any text, alone on a line for any lines, and 17.3~0.1 for any number that
 // is no further from 17.3 than 0.1.
 #include <gtest/gtest.h>
@@ -67,6 +71,29 @@ std::vector<Case> cases_in(const std::string& file) {
     return cases;
 }
 
+std::vector<Case> page_in(const std::string& file) {
+    std::vector<Case> cases{{file, {}}};
+    auto& steps = cases[0].steps;
+    bool console = false, continued = false;
+    std::size_t number = 0;
+    for (const std::string& line : lines_of(test::read_text(file))) {
+        ++number;
+        if (line.starts_with("```")) {
+            console = line == "```console";
+        } else if (console && (continued || line.starts_with("$ "))) {
+            if (continued) {
+                steps.back().command += "\n" + line;
+            } else {
+                steps.push_back({number, line.substr(2), 0, {}});
+            }
+            continued = line.ends_with('\\');
+        } else if (console) {
+            steps.at(steps.size() - 1).streams['|'].push_back(line);
+        }
+    }
+    return cases;
+}
+
 /** Takes the number off the start of a text, if there is one. */
 bool take_number(std::string_view& text, double& value) {
     const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
@@ -116,16 +143,17 @@ std::string names() {
     const auto folder_of = [](const char* program) {
         return std::filesystem::path{program}.parent_path().string();
     };
-    return "PATH='" + folder_of(QUO_TOOL) + "':'" + folder_of(QUO_MAKE_HEADER) + R"(':"$PATH")" +
+    return "PATH='" + folder_of(QUO_TOOL) + "':'" + folder_of(QUO_MAKE_HEADER) + "':'" +
+           folder_of(QUO_PIXEL_PLACE) + R"(':"$PATH")" +
            "\nscenes='" QUO_TEST_DATA "/scenes' data='" QUO_TEST_DATA "/quo' docs='" QUO_TEST_DATA
-           "/../../docs'\n" +
+           "/../../docs' sources='" QUO_TEST_DATA "/../..'\n" +
            R"(try() { quo "$@" || echo "[$?]"; })" + "\n";
 }
 
 class Transcript : public testing::TestWithParam<std::filesystem::path> {};
 
 TEST_P(Transcript, Holds) {
-    const auto cases = cases_in(GetParam());
+    const auto cases = (GetParam().extension() == ".md" ? page_in : cases_in)(GetParam().string());
     ASSERT_FALSE(cases.empty());
     for (const Case& one : cases) {
         const test::TemporaryFolder folder;
@@ -142,7 +170,9 @@ TEST_P(Transcript, Holds) {
 
 std::vector<std::filesystem::path> files() {
     const std::filesystem::directory_iterator folder{QUO_CASES};
-    return {begin(folder), end(folder)};
+    std::vector<std::filesystem::path> all{begin(folder), end(folder)};
+    all.emplace_back(QUO_TEST_DATA "/../../docs/tutorial.md");
+    return all;
 }
 INSTANTIATE_TEST_SUITE_P(Cases, Transcript, testing::ValuesIn(files()),
                          [](const auto& file) { return file.param.stem().string(); });

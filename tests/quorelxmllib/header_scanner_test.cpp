@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <cstdint>
 #include <string>
 
 #include "header_files.h"
@@ -112,6 +114,39 @@ TEST_F(HeaderScanner, ReadsLongFiles) {
                       ".5</val><" + name + "/>";
         }
         EXPECT_TRUE(expect_as_libxml2(test::header_text(inside)));
+    }
+}
+
+/** Counts the elements of one name, and the most that the tree held when one was complete. */
+struct Values : quo::ElementChoice {
+    void starts() override { count = 0; }
+    bool begins(const quo::HeaderTree& tree, quo::Node element, int) override {
+        return tree.is_named(element, "val");
+    }
+    void ends(int) override {}
+    void take(const quo::HeaderTree& tree, quo::Node element) override {
+        most_bytes = std::max(most_bytes, tree.text_bytes());
+        most_nodes = std::max(most_nodes, static_cast<std::uint32_t>(element));
+        ++count;
+    }
+    std::uint32_t count = 0, most_bytes = 0, most_nodes = 0;
+};
+
+// By either way, beside a thousand names that share no place.
+TEST_F(HeaderScanner, KeepsNoMoreOfALongFileThanWasChosen) {
+    std::string inside;
+    for (int i = 0; i < 9000; ++i)
+        inside += "<val N=\"1\">17.3</val><name_of_many_letters_" + std::to_string(i) +
+                  " M=\"2\">x</name_of_many_letters_" + std::to_string(i) + ">";
+    for (const char* last : {"<b/>", "<b></b >"}) {
+        test::write_text(file_, test::header_text(inside + last));
+        quo::HeaderSource source;
+        quo::HeaderTree tree;
+        Values values;
+        EXPECT_EQ(source.open(file_.c_str()), 0);
+        EXPECT_EQ(quo::parse_header(source, tree, nullptr, &values), 0);
+        EXPECT_TRUE(values.count == 9000 && values.most_bytes < 70000 && values.most_nodes < 8)
+            << values.most_bytes;
     }
 }
 

@@ -1,13 +1,26 @@
-# bash completion for quo: its verbs and their options as its own help tells them, then file names.
+# bash completion for quo: verbs, options and their values as its own help tells them, then file names.
 _quo() {
-    local current=${COMP_WORDS[COMP_CWORD]} words
+    local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]} command=(quo) help verbs words
     COMPREPLY=()
-    if [ "$COMP_CWORD" -eq 1 ]; then
-        words=$(quo --help 2>/dev/null | sed -n '/^Subcommands:/,/^$/ s/^  \([a-z][a-z-]*\) .*/\1/p')
-        mapfile -t COMPREPLY < <(compgen -W "$words --help --version" -- "$current")
-    elif [ "${current#-}" != "$current" ]; then
-        words=$(quo "${COMP_WORDS[1]}" --help 2>/dev/null | grep -oE -- '--[a-z][a-z-]*' | sort -u)
-        mapfile -t COMPREPLY < <(compgen -W "$words" -- "$current")
+    # "--to=gr" comes as three words.
+    [ "$current" = = ] && current=
+    [ "$previous" = = ] && previous=${COMP_WORDS[COMP_CWORD - 2]}
+    while true; do
+        help=$("${command[@]}" --help 2>/dev/null)
+        verbs=$(sed -n '/^Subcommands:/,/^$/ s/^  \([a-z][a-z-]*\) .*/\1/p' <<<"$help")
+        [ -n "$verbs" ] && [ ${#command[@]} -lt "$COMP_CWORD" ] || break
+        command+=("${COMP_WORDS[${#command[@]}]}")
+    done
+    if [[ $previous =~ ^--[a-z][a-z-]*$ ]]; then
+        words=$(sed -n "s/^ *\(-[a-z],\)\{0,1\}$previous [^ ]*{\([^}]*\)}.*/\2/p" <<<"$help")
+        if [ -n "$words" ]; then
+            mapfile -t COMPREPLY < <(compgen -W "${words//,/ }" -- "$current")
+            return
+        fi
+    fi
+    if [ -n "$verbs" ] || [ "${current#-}" != "$current" ]; then
+        words=$(grep -oE -- '--[a-z][a-z-]*' <<<"$help" | sort -u)
+        mapfile -t COMPREPLY < <(compgen -W "$verbs $words" -- "$current")
     else
         compopt -o filenames 2>/dev/null
         mapfile -t COMPREPLY < <(compgen -f -- "$current")

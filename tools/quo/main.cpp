@@ -5,6 +5,7 @@
 
 #include "commands.h"
 #include "document.h"
+#include "examples.h"
 #include "failure.h"
 #include "interrupt.h"
 
@@ -48,6 +49,7 @@ int run(int argc, char** argv) {
     program.details(kFooter);
     program.version("quo " QUO_TOOL_VERSION);
     for (const auto add : tool::kVerbs) add(program);
+    for (const auto& [verb, lines] : tool::kExamples) program.examples(verb, lines);
     program.change(kHeaders, header_name);
     program.change(kRasters, raster_name);
     try {

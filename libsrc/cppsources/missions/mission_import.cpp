@@ -1,6 +1,5 @@
 #include "quo_base/mission_import.h"
 
-#include <dlfcn.h>
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -8,8 +7,6 @@
 #include <array>
 #include <bit>
 #include <cerrno>
-#include <cstdio>
-#include <cstdlib>
 #include <filesystem>
 #include <functional>
 #include <limits>
@@ -25,6 +22,7 @@
 #include "quorelxmllib/header_session.h"
 #include "sarutillib/ground/bounded_text.h"
 #include "sarutillib/ground/file_io.h"
+#include "sarutillib/ground/own_module.h"
 
 namespace quo {
 namespace {
@@ -36,30 +34,20 @@ namespace fs = std::filesystem;
 
 // --- The measurement --------------------------------------------------------------------------------------------
 
-MeasurementEntry entry_of(const std::string& file) {
-    void* const module = dlopen(file.c_str(), RTLD_NOW | RTLD_LOCAL);  // stays loaded
-    return module ? reinterpret_cast<MeasurementEntry>(dlsym(module, kMeasurementEntryName)) : nullptr;
-}
-
-/** The function of the module that holds libtiff: the one that QUO_TIFF_MODULE names, else beside the library. */
+/** The function of the module that holds libtiff: the one that QUO_TIFF_MODULE names, else the library's. */
 MeasurementEntry measurement_entry() {
-    // Secure: a program with raised rights does not load what its caller names.
-    if (const char* const named = secure_getenv("QUO_TIFF_MODULE"))
-        if (const MeasurementEntry entry = entry_of(named)) return entry;
-    Dl_info info{};
-    std::string folder;
-    if (dladdr(reinterpret_cast<const void*>(&quo_import_sentinel1), &info) && info.dli_fname)
-        folder = info.dli_fname;
-    folder.erase(folder.rfind('/') + 1);
-    // Without a folder the name would be looked for where the process happens to work.
-    for (const char* const place : {"quo_base/libquo_base_tiff.so", "libquo_base_tiff.so"})
-        if (const MeasurementEntry entry = folder.empty() ? nullptr : entry_of(folder + place)) return entry;
-    refuse(QUO_REFUSED,
-           "libquo_base_tiff.so, which reads measurements, is neither beside the library in quo_base/ nor named "
-           "in QUO_TIFF_MODULE");
+    const auto itself = [](MeasurementEntry entry) { return entry; };
+    const char* const named = setting("QUO_TIFF_MODULE");
+    MeasurementEntry entry = named ? use_module<MeasurementEntry>(named, kMeasurementEntryName, itself) : nullptr;
+    if (!entry) entry = use_own_module<MeasurementEntry>("libquo_base_tiff.so", kMeasurementEntryName, itself);
+    if (!entry)
+        refuse(QUO_REFUSED,
+               "libquo_base_tiff.so, which reads measurements, is neither beside the library in quo_base/ nor "
+               "named in QUO_TIFF_MODULE");
+    return entry;
 }
 
-std::unique_ptr<Measurement> open_measurement(const std::string& file, const Sentinel1Product& product) {
+std::unique_ptr<Measurement> open_measurement(const std::string& file, const MissionProduct& product) {
     char why[256] = "";
     std::unique_ptr<Measurement> measurement{
         measurement_entry()(kMeasurementVersion, file.c_str(), why, sizeof why)};
@@ -80,42 +68,61 @@ std::unique_ptr<Measurement> open_measurement(const std::string& file, const Sen
  * integers. */
 class BlockWriter {
 public:
-    BlockWriter(Measurement& measurement, BufferFile& raster) : measurement_{measurement}, raster_{raster} {
+    BlockWriter(const quo_import_request& request, const std::string& file, Measurement& measurement,
+                BufferFile& raster)
+        : request_{request}, file_{file}, measurement_{measurement}, raster_{raster} {
         const std::size_t samples =
             static_cast<std::size_t>(measurement.block_lines) * static_cast<std::size_t>(measurement.samples);
         constexpr std::size_t kMost = std::size_t{1} << 26;
-        if (samples > kMost) refuse(QUO_REFUSED, "the measurement's blocks are longer than is believed");
+        if (samples > kMost)
+            refuse(QUO_REFUSED, file + ": its strips or tiles come in blocks of " + std::to_string(samples) +
+                                    " samples, more than the " + std::to_string(kMost) +
+                                    " that are unpacked at a time");
         block_.resize(samples * bytes_of(measurement.type));
         if (widens()) wide_.resize(samples);
     }
 
-    /** False where the measurement is cut short. */
-    bool copy(std::int32_t block) {
-        if (!measurement_.read(block, block_.data())) return false;
-        const std::int64_t first = std::int64_t{block} * measurement_.block_lines;
-        const auto lines =
-            static_cast<std::size_t>(std::min<std::int64_t>(measurement_.block_lines, measurement_.lines - first));
-        const std::size_t samples = lines * static_cast<std::size_t>(measurement_.samples);
-        if (!widens()) {
-            write(block_.data(), samples * bytes_of(measurement_.type));
-            return true;
-        }
-        const auto* const narrow = reinterpret_cast<const std::uint16_t*>(block_.data());
-        std::copy_n(narrow, samples, wide_.begin());
-        write(reinterpret_cast<const char*>(wide_.data()), samples * sizeof wide_[0]);
-        return true;
+    void copy() {
+        tell();
+        for (std::int32_t block = 0; std::int64_t{block} * measurement_.block_lines < measurement_.lines; ++block)
+            copy(block);
     }
 
 private:
+    void copy(std::int32_t block) {
+        const std::int64_t first = std::int64_t{block} * measurement_.block_lines;
+        if (!measurement_.read(block, block_.data()))
+            refuse(QUO_READ_FAILED, file_ + ": is cut short or damaged at line " + std::to_string(first));
+        const auto lines =
+            static_cast<std::size_t>(std::min<std::int64_t>(measurement_.block_lines, measurement_.lines - first));
+        const std::size_t samples = lines * static_cast<std::size_t>(measurement_.samples);
+        if (!widens()) return write(block_.data(), samples * bytes_of(measurement_.type));
+        const auto* const narrow = reinterpret_cast<const std::uint16_t*>(block_.data());
+        std::copy_n(narrow, samples, wide_.begin());
+        write(reinterpret_cast<const char*>(wide_.data()), samples * sizeof wide_[0]);
+    }
     [[nodiscard]] bool widens() const { return measurement_.type == MeasuredType::kUnsignedShort; }
     void write(const char* bytes, std::size_t count) {
         constexpr std::size_t kPiece = 1 << 24;  // the raster counts bytes in an int
-        for (std::size_t done = 0; done < count; done += kPiece)
-            raster_.write(bytes + done, static_cast<int>(std::min(kPiece, count - done)));
+        for (std::size_t done = 0; done < count; done += kPiece) {
+            const std::size_t piece = std::min(kPiece, count - done);
+            raster_.write(bytes + done, static_cast<int>(piece));
+            if (const int status = raster_.status())
+                refuse(status, std::string{request_.raster} + ": cannot be written");
+            written_ += static_cast<std::int64_t>(piece);
+            tell();
+        }
+    }
+    void tell() const {
+        if (request_.progress && request_.progress(request_.context, written_, raster_.rasterSize()) != 0)
+            refuse(QUO_REFUSED, std::string{request_.raster} + ": the import was ended");
     }
 
+    const quo_import_request& request_;
+    const std::string& file_;
     Measurement& measurement_;
     BufferFile& raster_;
+    std::int64_t written_ = 0;  // bytes
     std::vector<char> block_;
     std::vector<std::int32_t> wide_;
 };
@@ -137,22 +144,6 @@ void describe_raster(const Measurement& measurement, const char* name, BufferFil
     raster.setLines(measurement.lines);
     raster.setSamples(measurement.samples);
     raster.setType(cell_type(measurement.type));
-}
-
-void copy_samples(const quo_import_request& request, Measurement& measurement, BufferFile& raster) {
-    if (const int status = raster.create()) refuse(status, std::string{request.raster} + ": cannot be made");
-    BlockWriter writer{measurement, raster};
-    for (std::int32_t block = 0; std::int64_t{block} * measurement.block_lines < measurement.lines; ++block) {
-        const std::int64_t line = std::int64_t{block} * measurement.block_lines;
-        if (request.progress && request.progress(request.context, line, measurement.lines) != 0)
-            refuse(QUO_REFUSED, std::string{request.raster} + ": the import was ended");
-        if (!writer.copy(block))
-            refuse(QUO_READ_FAILED, "the measurement is cut short or damaged at line " + std::to_string(line));
-        if (const int status = raster.status())
-            refuse(status, std::string{request.raster} + ": cannot be written");
-    }
-    if (request.progress && request.progress(request.context, measurement.lines, measurement.lines) != 0)
-        refuse(QUO_REFUSED, std::string{request.raster} + ": the import was ended");
 }
 
 /** A link in the place of the raster, whose old file stays beside it until the link is kept. */
@@ -220,13 +211,23 @@ public:
         require(raster_.status());
     }
     void commit() {
-        if (pattern_.PatternSamples == 0) return;
+        if (pattern_.PatternSamples == 0) return remove_older();
         const HeaderSession session{header_.c_str()};
         require(pattern_.writehdr(header_.c_str()));
         require(raster_.commit());
     }
 
 private:
+    /** The pattern of a product that was imported under this name before. */
+    void remove_older() const {
+        std::error_code error;
+        AntennaPattern_Obj older;  // what somebody else has called so is none
+        if (!fs::exists(header_, error) || older.readhdr(header_.c_str()) != QUO_OK) return;
+        for (const std::string& file : {name_, header_})
+            if (!error) fs::remove(file, error);
+        errno = 0;
+        if (error) refuse(QUO_WRITE_FAILED, name_ + ": an older import's, cannot be removed: " + error.message());
+    }
     void require(int status) const {
         if (status != QUO_OK) refuse(status, name_ + ": cannot be written");
     }
@@ -238,7 +239,7 @@ private:
 
 /** Refuses to replace a file of the product itself, and what a link leads to: an older import may have left one to
  * a measurement. Only a link takes the place of a link. */
-void require_apart(const quo_import_request& request, const Sentinel1Files& files) {
+void require_apart(const quo_import_request& request, const MissionFiles& files) {
     const std::string raster = request.raster, orbit{text_or_empty(request.orbit_file)};
     std::error_code unknown;
     if (request.link == 0 && fs::is_symlink(raster, unknown))
@@ -254,7 +255,7 @@ void require_apart(const quo_import_request& request, const Sentinel1Files& file
     errno = 0;
 }
 
-void link_product(const Sentinel1Files& files, const Measurement& measurement, const std::string& raster_name,
+void link_product(const MissionFiles& files, const Measurement& measurement, const std::string& raster_name,
                   BufferFile& raster, const std::function<void()>& describe) {
     if (measurement.plain_from < 0 || measurement.plain_from > std::numeric_limits<std::int32_t>::max() ||
         measurement.type == MeasuredType::kUnsignedShort)
@@ -274,14 +275,13 @@ void link_product(const Sentinel1Files& files, const Measurement& measurement, c
     link.keep();
 }
 
-void import_product(const quo_import_request& request, quo_import_result& result) {
+void import_product(const MissionReader& reader, const quo_import_request& request, quo_import_result& result) {
     const auto given = [](const char* text) { return std::string{text ? text : ""}; };
     const std::string raster_name = request.raster, header = raster_name + ".hdr";
-    const Sentinel1Files files =
-        find_sentinel1_files(request.source, given(request.swath), given(request.polarization));
+    const MissionFiles files = reader.find(request.source, given(request.swath), given(request.polarization));
     require_apart(request, files);
-    const auto product = std::make_unique<Sentinel1Product>();
-    describe_sentinel1(files, given(request.orbit_file), *product);
+    const auto product = std::make_unique<MissionProduct>();
+    reader.describe(files, given(request.orbit_file), *product);
     const auto measurement = open_measurement(files.measurement, *product);
 
     BufferFile& raster = product->header.bufferFile;
@@ -296,7 +296,8 @@ void import_product(const quo_import_request& request, quo_import_result& result
     } else {
         BufferFile copy;
         copy.clone(&raster);
-        copy_samples(request, *measurement, copy);
+        if (const int status = copy.create()) refuse(status, raster_name + ": cannot be made");
+        BlockWriter{request, files.measurement, *measurement, copy}.copy();
         const HeaderSession session{header.c_str()};
         describe();
         if (const int status = copy.commit()) refuse(status, raster_name + ": cannot be written");
@@ -308,27 +309,33 @@ void import_product(const quo_import_request& request, quo_import_result& result
     result.ties = product->ties;
 }
 
-}  // namespace
-}  // namespace quo
-
-int quo_import_sentinel1(const quo_import_request* request, quo_import_result* result) noexcept {
-    quo::CallFrame frame{"quo_import_sentinel1", quo::kSource};
+/** What every mission's function of the interface does. */
+int import_from(const MissionReader& reader, const char* function, const quo_import_request* request,
+                quo_import_result* result) noexcept {
+    CallFrame frame{function, kSource};
     if (!result) return frame.fail(QUO_REFUSED, "There is no place for the result");
     *result = {};
     const auto fail = [&](int status, const char* line) {
-        quo::copy_bounded(result->message, line);
+        copy_bounded(result->message, line);
         return frame.fail(status, line);
     };
-    if (!request || quo::text_or_empty(request->source).empty() || quo::text_or_empty(request->raster).empty())
+    if (!request || text_or_empty(request->source).empty() || text_or_empty(request->raster).empty())
         return fail(QUO_REFUSED, "The product or the raster has no name");
     try {
-        quo::import_product(*request, *result);
+        import_product(reader, *request, *result);
         return frame.success();
-    } catch (const quo::MissionRefusal& refusal) {
+    } catch (const MissionRefusal& refusal) {
         return fail(refusal.status(), refusal.what());
     } catch (const std::bad_alloc&) {
         return fail(QUO_NO_MEMORY, "Memory allocation failure");
     } catch (const std::exception& other) {  // std::filesystem, of a name that it cannot take
         return fail(QUO_REFUSED, other.what());
     }
+}
+
+}  // namespace
+}  // namespace quo
+
+int quo_import_sentinel1(const quo_import_request* request, quo_import_result* result) noexcept {
+    return quo::import_from(quo::kSentinel1, "quo_import_sentinel1", request, result);
 }

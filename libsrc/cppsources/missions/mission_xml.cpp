@@ -9,7 +9,6 @@
 #include <cmath>
 #include <limits>
 
-#include "quo_base/api.h"
 #include "quorelxmllib/header_source.h"
 #include "sarutillib/ground/file_io.h"
 #include "sarutillib/ground/number_text.h"
@@ -94,9 +93,8 @@ std::string MissionXml::Element::attribute(const char* name) const {
     return taken(xmlGetProp(node_, reinterpret_cast<const xmlChar*>(name)));
 }
 
-void MissionXml::Element::refuse(const std::string& why) const {
-    throw MissionRefusal{QUO_REFUSED,
-                         file_->name() + ": line " + std::to_string(xmlGetLineNo(node_)) + ": " + why};
+void MissionXml::Element::refuse(const std::string& why, int status) const {
+    throw MissionRefusal{status, file_->name() + ": line " + std::to_string(xmlGetLineNo(node_)) + ": " + why};
 }
 
 MissionXml::Element MissionXml::Element::at(std::string_view path) const {

@@ -9,6 +9,7 @@
 #include <string_view>
 #include <vector>
 
+#include "quo_base/api.h"
 #include "sarutillib/ground/iso_time.h"
 
 // NOLINTNEXTLINE(bugprone-reserved-identifier,readability-identifier-naming): libxml2's own name
@@ -53,7 +54,7 @@ public:
         /** @} */
         [[nodiscard]] bool truth(std::string_view path) const;  ///< false where it is missing
 
-        [[noreturn]] void refuse(const std::string& why) const;
+        [[noreturn]] void refuse(const std::string& why, int status = QUO_REFUSED) const;
 
     private:
         _xmlNode* node_;

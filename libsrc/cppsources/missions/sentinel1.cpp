@@ -7,11 +7,14 @@
 #include <span>
 #include <vector>
 
+#include "generalSAR/derived_raster/corner_points.h"
+#include "missions/mission_xml.h"
 #include "missions/orbit_file.h"
 #include "quo_base/MatrixAlgebraANSI.h"
 #include "quo_base/gen_utils.h"
 #include "quo_base/geometry.h"
 #include "sarutillib/ground/bounded_text.h"
+#include "sarutillib/ground/letters.h"
 
 namespace quo {
 namespace {
@@ -21,12 +24,6 @@ using Element = MissionXml::Element;
 template <std::size_t N>
 void put(char (&field)[N], const std::string& text) {
     copy_bounded(field, text.empty() ? "NOT_AVAILABLE" : text);
-}
-
-std::string upper(std::string text) {
-    for (char& c : text)
-        if (c >= 'a' && c <= 'z') c = static_cast<char>(c - 'a' + 'A');
-    return text;
 }
 
 std::string date_text(const SplitTime& time) {
@@ -181,7 +178,7 @@ void describe_processing(const std::string& manifest, DataSetInfo_Obj& info) {
             put(info.ProcessingDate, date_text(*stop));
 }
 
-void set_data_set(const Annotation& a, const Sentinel1Files& files, GeneralSAR& product) {
+void set_data_set(const Annotation& a, const MissionFiles& files, GeneralSAR& product) {
     DataSetInfo_Obj& info = product.dataSetInfo;
     const std::string mission = a.header.text("missionId"), polarization = a.header.text("polarisation");
     put(info.OrbitNumber, std::to_string(a.header.integer("absoluteOrbitNumber")));
@@ -232,7 +229,7 @@ void set_grid(const Annotation& a, ImageGrid_Obj& grid) {
     if (a.detected && lists.empty()) a.root.refuse("no list from ground to slant range");
     grid.Bursts = a.detected ? 0 : static_cast<std::int32_t>(bursts.size());
     grid.GroundLists = static_cast<std::int32_t>(lists.size());
-    if (const int status = grid.createBuffers()) throw MissionRefusal{status, "no memory for the image's grid"};
+    if (const int status = grid.createBuffers()) a.root.refuse("no memory for the image's grid", status);
     if (grid.Bursts > 0) grid.LinesPerBurst = a.root.integer("swathTiming/linesPerBurst");
     for (std::size_t i = 0; i < grid.BurstStart_s.size(); ++i)
         grid.BurstStart_s[i] = bursts[i].time("azimuthTime").after(grid.Epoch_s);
@@ -271,24 +268,28 @@ void set_region(const Annotation& a, const ImageGrid_Obj& grid, GeneralSAR& prod
     if (!(step_s > 0.0 || a.samples == 1)) a.root.refuse("near and far range make no image");
     region.SetFastAxe(a.near_s, step_s, a.samples);
     product.GSenable(gsRoi);
-    if (product.orbit.SVGetGeoCoords(&product.geoCoords, &product.roi) == QUO_OK) product.GSenable(gsGeoCoords);
+    if (place_corners(grid, a.lines, a.samples, product) != QUO_OK)
+        a.root.refuse("the orbit does not see the image's corners");
+    product.GSenable(gsGeoCoords);
 }
 
 // --- Polynomials ------------------------------------------------------------------------------------------------
 
+/** Where 1, x, x^2, x^3 and x^4 stand in a polynomial of a header. */
+constexpr std::array<std::size_t, 5> kPowers{0, 1, 4, 5, 6};
+
 /** Takes over a polynomial in range time, whose terms stand in ascending powers. */
 void take_terms(const Element& list, const SplitTime& time, double t0_s, const std::vector<double>& terms,
                 poly& polynomial) {
-    constexpr std::array<std::size_t, 5> kPowers{0, 1, 4, 5, 6};  // where 1, x, x^2, x^3 and x^4 stand
     if (terms.empty() || terms.size() > kPowers.size()) list.refuse("a polynomial with more terms than are known");
     for (std::size_t i = 0; i < terms.size(); ++i) polynomial.pol[kPowers[i]] = terms[i];
     polynomial.trg0 = t0_s;
     polynomial.taz0 = time.seconds();
 }
 
-/** Fits y over x - x0 with a polynomial of degree 4 in the terms of `polynomial`. */
-void fit_terms(std::span<const double> x, std::span<const double> y, double x0, poly& polynomial) {
-    constexpr int kTerms = 5;
+/** Fits y over x - x0 with a polynomial of degree 4 in the terms of `polynomial`. 0 or the fit's status. */
+int fit_terms(std::span<const double> x, std::span<const double> y, double x0, poly& polynomial) {
+    constexpr int kTerms = std::ssize(kPowers);
     const double scale = 1.0 / (x.back() - x0);
     std::vector<double> rows;
     for (const double at : x) {
@@ -297,10 +298,10 @@ void fit_terms(std::span<const double> x, std::span<const double> y, double x0, 
     }
     double terms[kTerms];
     if (const int status = lsq_fit(rows.data(), static_cast<int>(x.size()), kTerms, y.data(), terms, nullptr))
-        throw MissionRefusal{status, "the conversion between slant and ground range has no fit"};
-    constexpr std::array<std::size_t, kTerms> kPowers{0, 1, 4, 5, 6};
+        return status;
     double power = 1.0;
     for (std::size_t i = 0; i < kPowers.size(); ++i, power *= scale) polynomial.pol[kPowers[i]] = terms[i] * power;
+    return QUO_OK;
 }
 
 void set_ground_polynomials(const Annotation& a, const ImageGrid_Obj& grid, polySAR& set) {
@@ -315,8 +316,9 @@ void set_ground_polynomials(const Annotation& a, const ImageGrid_Obj& grid, poly
             range_s.push_back(2.0 * slant_m / kLightSpeed);
             delay_s.push_back(range_s.back() - range_s.front());
         }
-        fit_terms(range_s, ground_m, range_s.front(), set.SL2GR[k]);
-        fit_terms(ground_m, delay_s, 0.0, set.GR2SL[k]);
+        int status = fit_terms(range_s, ground_m, range_s.front(), set.SL2GR[k]);
+        if (status == QUO_OK) status = fit_terms(ground_m, delay_s, 0.0, set.GR2SL[k]);
+        if (status != QUO_OK) a.root.refuse("the conversion between slant and ground range has no fit", status);
         for (poly* polynomial : {static_cast<poly*>(&set.SL2GR[k]), static_cast<poly*>(&set.GR2SL[k])}) {
             polynomial->trg0 = range_s.front();
             polynomial->taz0 = grid.Epoch_s + grid.GroundTime_s[static_cast<std::size_t>(k)];
@@ -338,7 +340,7 @@ void set_polynomials(const Annotation& a, const ImageGrid_Obj& grid, GeneralSAR&
     polySAR& set = product.polynomials;
     if (const int status = set.CreatePolys(static_cast<int>(centroids.size()), static_cast<int>(rates.size()),
                                            grid.GroundLists, grid.GroundLists, 1, 1))
-        throw MissionRefusal{status, "no memory for the polynomials"};
+        a.root.refuse("no memory for the polynomials", status);
     const bool from_data = a.processing.text("dcMethod") != "Geometry Analysis";
     const char* const terms = from_data ? "dataDcPolynomial" : "geometryDcPolynomial";
     for (std::size_t i = 0; i < centroids.size(); ++i)
@@ -349,7 +351,8 @@ void set_polynomials(const Annotation& a, const ImageGrid_Obj& grid, GeneralSAR&
                    set.FR[i]);
     set_ground_polynomials(a, grid, set);
     const polyDC broadside{};
-    (void)product.orbit.SVGetSlantToAnglesPolys(&product.roi.Roi, &broadside, &set.SL2THETA[0], &set.SL2PHI[0]);
+    if (product.orbit.SVGetSlantToAnglesPolys(&product.roi.Roi, &broadside, &set.SL2THETA[0], &set.SL2PHI[0]))
+        a.root.refuse("the orbit gives no incidence and look angles over the image");
     product.GSenable(gsPolySAR);
 }
 
@@ -361,7 +364,7 @@ void set_attitude(const Annotation& a, const ImageGrid_Obj& grid, GeneralSAR& pr
     GrPtGeometry at{};
     if (grid.pixelTimes({1, &line, &sample}, {&azimuth_s, &range_s}) != QUO_OK ||
         product.orbit.SVGetGeometry(azimuth_s, range_s, 0.0, &at) != QUO_OK)
-        return;
+        a.root.refuse("the orbit does not see the image's middle");
     const double distance_m = 0.5 * kLightSpeed * range_s, lambda_m = product.samplingConstants.lambda_m;
     attitude.Eq_distance = distance_m;
     attitude.Eq_speed = std::sqrt(0.5 * std::abs(at.fm_rate_hz_s) * lambda_m * distance_m);
@@ -391,8 +394,7 @@ void set_pattern(const Annotation& a, const ImageGrid_Obj& grid, AntennaPattern_
     pattern.PatternSamples = static_cast<std::int32_t>(angles.size());
     pattern.StartAngle = angles.front();
     pattern.DeltaAngle = (angles.back() - angles.front()) / static_cast<double>(angles.size() - 1);
-    if (const int status = pattern.createBuffers())
-        throw MissionRefusal{status, "no memory for the antenna pattern"};
+    if (const int status = pattern.createBuffers()) a.root.refuse("no memory for the antenna pattern", status);
     for (std::size_t i = 0; i < angles.size(); ++i) {
         const double angle = pattern.StartAngle + static_cast<double>(i) * pattern.DeltaAngle;
         const auto above = std::clamp<std::ptrdiff_t>(std::ranges::upper_bound(angles, angle) - angles.begin(), 1,
@@ -406,32 +408,17 @@ void set_pattern(const Annotation& a, const ImageGrid_Obj& grid, AntennaPattern_
 
 // --- Tie points -------------------------------------------------------------------------------------------------
 
-/** Arrays of what the annotation states of its tie points, and of what is found instead. */
-struct TiePoints {
-    std::vector<double> line, sample, latitude, longitude, height_m;
-    std::vector<double> azimuth_s, range_s;
-
-    explicit TiePoints(const Annotation& a) {
-        for (const Element& point :
-             a.root.list("geolocationGrid/geolocationGridPointList", "geolocationGridPoint")) {
-            line.push_back(point.number("line"));
-            sample.push_back(point.number("pixel"));
-            latitude.push_back(point.number("latitude"));
-            longitude.push_back(point.number("longitude"));
-            height_m.push_back(point.number("height"));
-        }
-        azimuth_s.resize(line.size());
-        range_s.resize(line.size());
+TiePoints stated_ties(const Annotation& a) {
+    TiePoints ties;
+    for (const Element& point : a.root.list("geolocationGrid/geolocationGridPointList", "geolocationGridPoint")) {
+        ties.line.push_back(point.number("line"));
+        ties.sample.push_back(point.number("pixel"));
+        ties.latitude.push_back(point.number("latitude"));
+        ties.longitude.push_back(point.number("longitude"));
+        ties.height_m.push_back(point.number("height"));
     }
-    [[nodiscard]] std::size_t count() const { return line.size(); }
-
-    /** When the orbit sees them; not-a-number for those that it does not see. False where it sees none. */
-    bool find_times(const GeneralSAROrbit& orbit) {
-        OrbitTargets targets{count(), latitude.data(), longitude.data(), height_m.data()};
-        return orbit.earth2sat(targets, {azimuth_s.data(), range_s.data(), nullptr}) == QUO_OK &&
-               std::ranges::any_of(azimuth_s, [](double t) { return std::isfinite(t); });
-    }
-};
+    return ties;
+}
 
 /** The image's lines are a part of the two-way delay off their zero-Doppler times; the annotation does not tell
  * the range time at which it is nothing, the tie points do. */
@@ -453,55 +440,6 @@ void find_delay(const TiePoints& ties, ImageGrid_Obj& grid) {
     grid.DelayReference_s = sum_s / count;
 }
 
-/** Root mean square and largest of some differences. */
-class Differences {
-public:
-    void add(double difference) {
-        ++count_;
-        squares_ += difference * difference;
-        most_ = std::max(most_, std::abs(difference));
-    }
-    [[nodiscard]] int count() const { return count_; }
-    void tell(double& rms, double& most) const {
-        rms = std::sqrt(squares_ / std::max(1, count_));
-        most = most_;
-    }
-
-private:
-    int count_ = 0;
-    double squares_ = 0.0, most_ = 0.0;
-};
-
-quo_tie_points compare(const TiePoints& ties, const ImageGrid_Obj& grid, const GeneralSAROrbit& orbit) {
-    const std::size_t n = ties.count();
-    std::vector<double> first(n), second(n), sample(n), azimuth_s(n), range_s(n), x(n), y(n), z(n);
-    OrbitGround ground{};
-    ground.x_m = x.data();
-    ground.y_m = y.data();
-    ground.z_m = z.data();
-    const OrbitSamples samples{n, azimuth_s.data(), range_s.data(), nullptr, ties.height_m.data()};
-    quo_tie_points told{};
-    if (grid.timePixels({n, ties.azimuth_s.data(), ties.range_s.data()},
-                        {first.data(), second.data(), sample.data()}) != QUO_OK ||
-        grid.pixelTimes({n, ties.line.data(), ties.sample.data()}, {azimuth_s.data(), range_s.data()}) != QUO_OK ||
-        orbit.sat2earth(samples, ground) != QUO_OK)
-        return told;
-    Differences lines, columns, places;
-    for (std::size_t i = 0; i < n; ++i) {
-        if (std::isnan(first[i]) || std::isnan(x[i])) continue;  // in no burst
-        const double off = first[i] - ties.line[i], other = second[i] - ties.line[i];
-        lines.add(std::abs(other) < std::abs(off) ? other : off);
-        columns.add(sample[i] - ties.sample[i]);
-        const Vec3 stated = from_geodetic({ties.latitude[i], ties.longitude[i], ties.height_m[i]});
-        places.add(norm(Vec3{x[i], y[i], z[i]} - stated));
-    }
-    told.count = lines.count();
-    lines.tell(told.rms_line, told.most_line);
-    columns.tell(told.rms_sample, told.most_sample);
-    places.tell(told.rms_ground_m, told.most_ground_m);
-    return told;
-}
-
 std::vector<MissionVector> stated_vectors(const Annotation& a) {
     std::vector<MissionVector> vectors;
     for (const Element& orbit : a.general.list("orbitList", "orbit"))
@@ -513,7 +451,7 @@ std::vector<MissionVector> stated_vectors(const Annotation& a) {
 
 }  // namespace
 
-void describe_sentinel1(const Sentinel1Files& files, const std::string& orbit_file, Sentinel1Product& product) {
+void describe_sentinel1(const MissionFiles& files, const std::string& orbit_file, MissionProduct& product) {
     const MissionXml xml{files.annotation};
     const Annotation a{xml.root()};
     GeneralSAR& header = product.header;
@@ -525,27 +463,18 @@ void describe_sentinel1(const Sentinel1Files& files, const std::string& orbit_fi
     set_swath(a, header);
     set_data_set(a, files, header);
     set_grid(a, product.grid);
-    TiePoints ties{a};
+    TiePoints ties = stated_ties(a);
     if (ties.find_times(header.orbit)) find_delay(ties, product.grid);
     // The tie points are of the annotation's own orbit: by another one the delay would take up what that one
     // mends.
     if (!orbit_file.empty())
         set_orbit(header, read_orbit_file(orbit_file, a.header.text("missionId"), a.first_line, a.last_line),
                   orbit_file);
-    if (ties.find_times(header.orbit)) product.ties = compare(ties, product.grid, header.orbit);
+    if (ties.find_times(header.orbit)) product.ties = ties.compare(product.grid, header.orbit);
     set_region(a, product.grid, header);
     set_polynomials(a, product.grid, header);
     set_attitude(a, product.grid, header);
     set_pattern(a, product.grid, header.antennaPattern);
-}
-
-void write_mission_header(Sentinel1Product& product, const std::string& header) {
-    for (int i = 0; i < GeneralSAR::kObjects; ++i)
-        product.header.GSget(static_cast<GSObject>(i))->setExactNumbers(true);
-    product.header.roi.Roi.setExactNumbers(true);
-    product.grid.setExactNumbers(true);
-    if (product.grid.writehdr(header.c_str()) != QUO_OK || product.header.GSwrite(header.c_str()) != QUO_OK)
-        throw MissionRefusal{QUO_WRITE_FAILED, header + ": cannot be written"};
 }
 
 }  // namespace quo

@@ -5,18 +5,14 @@
 #include <system_error>
 #include <vector>
 
+#include "missions/mission_xml.h"
 #include "missions/sentinel1.h"
+#include "sarutillib/ground/letters.h"
 
 namespace quo {
 namespace {
 
 namespace fs = std::filesystem;
-
-std::string lower(std::string text) {
-    for (char& c : text)
-        if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
-    return text;
-}
 
 /** The parts of an annotation's name: s1a-iw1-slc-vv-... */
 std::vector<std::string> parts_of(const fs::path& annotation) {
@@ -78,8 +74,8 @@ fs::path choose(const std::vector<fs::path>& all, const std::string& source, con
 
 }  // namespace
 
-Sentinel1Files find_sentinel1_files(const std::string& source, const std::string& swath,
-                                    const std::string& polarization) {
+MissionFiles find_sentinel1_files(const std::string& source, const std::string& swath,
+                                  const std::string& polarization) {
     std::error_code error;
     fs::path path{source};
     if (!fs::exists(path, error)) throw MissionRefusal{QUO_NOT_OPENED, source + ": cannot be opened"};
@@ -94,7 +90,7 @@ Sentinel1Files find_sentinel1_files(const std::string& source, const std::string
     const fs::path product = folder.empty()             ? fs::path{".."}
                              : folder.has_parent_path() ? folder.parent_path()
                                                         : fs::path{"."};
-    Sentinel1Files files{annotation.string(), "", ""};
+    MissionFiles files{annotation.string(), "", ""};
     for (const char* const ending : {".tiff", ".tif"}) {
         const fs::path measurement = product / "measurement" / (annotation.stem().string() + ending);
         if (files.measurement.empty() && fs::exists(measurement, error)) files.measurement = measurement.string();

@@ -24,7 +24,8 @@ struct Complaint {
     char text[256] = "";
 };
 
-int keep_complaint(TIFF* /*file*/, void* complaint, const char* /*module*/, const char* format, va_list values) {
+[[gnu::format(printf, 4, 0)]] int keep_complaint(TIFF* /*file*/, void* complaint, const char* /*module*/,
+                                                 const char* format, va_list values) {
     char* const text = static_cast<Complaint*>(complaint)->text;
     // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): libtiff has started the list
     if (text[0] == '\0') std::vsnprintf(text, sizeof Complaint::text, format, values);

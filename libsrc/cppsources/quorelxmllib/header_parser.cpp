@@ -52,15 +52,14 @@ std::string attributes_of(xmlNode* element) {
  * blanks between elements from text, keeps only the open elements and the first and last child of each. */
 class Builder {
 public:
-    Builder(HeaderTree& tree, ElementChoice* choice) : tree_{tree}, choice_{choice} {
+    Builder(HeaderTree& tree, ElementChoice* choice) : tree_{tree}, filter_{tree, choice} {
         open_.push_back(Node::none);
     }
 
     void begin(xmlParserCtxt& parser) {
         xmlNode* const element = parser.node;
         element->_private = this;  // taken
-        if (choice_ && kept_level_ < 0 && choice_->begins(*element, level())) kept_level_ = level();
-        open_.push_back(keeps() ? append(*element) : Node::none);
+        open_.push_back(append(*element));
         xmlFreePropList(std::exchange(element->properties, nullptr));
     }
     /** Takes what stands in the parser's element, or in the document outside the root, since this was called last.
@@ -80,14 +79,14 @@ public:
     void end(xmlNode* element) {
         const Node node = open_.back();
         const xmlNode* const only = element->children;
-        if (keeps() && only && !only->next && only->type == XML_TEXT_NODE && !only->_private)
+        if (filter_.keeps() && only && !only->next && only->type == XML_TEXT_NODE && !only->_private)
             tree_.set_leaf_text(node, tree_.keep(view(only->content)));
         else
             take_texts(element);
         xmlFreeNodeList(std::exchange(element->children, nullptr));
         element->last = nullptr;
         open_.pop_back();
-        if (choice_) tell_choice(node);
+        filter_.end(node);
     }
 
     /** Runs a step of a parser's callback, through which nothing may be thrown. */
@@ -114,7 +113,6 @@ public:
 private:
     /** How deep the next element will lie; the root at 0. */
     [[nodiscard]] int level() const noexcept { return static_cast<int>(open_.size()) - 1; }
-    [[nodiscard]] bool keeps() const noexcept { return !choice_ || kept_level_ >= 0; }
 
     /** Whether the parser does without a node that is not the last of its parent: it still looks at the first, and
      * at what stands beside the root. */
@@ -124,24 +122,17 @@ private:
     }
     static bool is_document(const xmlNode& node) { return node.type == XML_DOCUMENT_NODE; }
     Node append(xmlNode& element) {
+        const std::uint32_t before_name = tree_.text_bytes();
         const Node node = tree_.append(open_.back(), NodeKind::element, name_place(element));
         if (element.ns) tree_.set_in_namespace(node);
+        const std::uint32_t with_name = tree_.text_bytes();
         if (element.nsDef || element.properties) tree_.set_attributes(node, tree_.keep(attributes_of(&element)));
+        filter_.begin(node, before_name, with_name);
         return node;
-    }
-    /** After an element has ended. */
-    void tell_choice(Node node) {
-        if (kept_level_ < 0) return choice_->ends(level());
-        if (kept_level_ < level()) return;
-        choice_->take(tree_, node);
-        choice_->ends(level());
-        kept_level_ = -1;
-        tree_.clear();
-        names_ = {};
     }
     void take(xmlNode* node) {
         node->_private = this;
-        if (!keeps()) return;
+        if (!filter_.keeps()) return;
         const auto append = [&](NodeKind kind, std::string_view content) {
             const bool named = kind == NodeKind::instruction || kind == NodeKind::reference;
             const std::uint32_t name = named ? tree_.keep(view(node->name)) : 0;
@@ -172,13 +163,12 @@ private:
         if (prefix) with_prefix.append(view(prefix)).append(":").append(view(element.name));
         const std::string_view whole = prefix ? with_prefix : view(element.name);
         std::uint32_t& place = names_[reinterpret_cast<std::uintptr_t>(element.name) / 8 % names_.size()];
-        if (tree_.kept(place) != whole) place = tree_.keep(whole);
+        if (!tree_.keeps(place, whole)) place = tree_.keep(whole);
         return place;
     }
 
     HeaderTree& tree_;
-    ElementChoice* choice_;
-    int kept_level_ = -1;                      // of the chosen element that is open
+    TreeFilter filter_;
     std::vector<Node> open_;                   // the open elements, outermost first; before them the document
     std::array<std::uint32_t, 1024> names_{};  // places of names kept
     bool failed_ = false, declared_ = false;
@@ -310,18 +300,13 @@ int read_text(void* context, char* buffer, int length) {
 
 }  // namespace
 
-int parse_header(HeaderSource& source, HeaderTree& tree, std::string* defect) {
+int parse_header(HeaderSource& source, HeaderTree& tree, std::string* defect, ElementChoice* choice) {
     if (source.rewind()) {
-        const int status = scan_header(source, tree);
+        const int status = scan_header(source, tree, choice);
         if (defect) defect->clear();
         if (status != QUO_REFUSED || !source.rewind()) return status;
     }
-    return parse_file(source, tree, nullptr, defect);
-}
-
-int parse_header(HeaderSource& source, ElementChoice& choice) {
-    HeaderTree tree;
-    return parse_file(source, tree, &choice, nullptr);
+    return parse_file(source, tree, choice, defect);
 }
 
 int parse_header(std::string_view text, HeaderTree& tree) {

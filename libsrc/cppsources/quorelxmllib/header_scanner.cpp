@@ -2,7 +2,7 @@
 
 #include <array>
 #include <cstring>
-#include <new>
+#include <exception>
 #include <string_view>
 #include <vector>
 
@@ -74,7 +74,8 @@ private:
 
 class Scanner {
 public:
-    Scanner(HeaderSource& source, HeaderTree& tree) : in_{source}, tree_{tree} {}
+    Scanner(HeaderSource& source, HeaderTree& tree, ElementChoice* choice)
+        : in_{source}, tree_{tree}, filter_{tree, choice} {}
 
     /** Whether the source holds one document of that form. */
     bool run() {
@@ -97,16 +98,15 @@ private:
     /** Within an element: its text and its end, or what stands before its next child, and that child's tag. */
     bool go_on() {
         in_.fill();
-        const Node element = open_.back();
+        const auto [element, leaf] = open_.back();
         const char* const first = in_.at;
         const std::size_t blanks = in_.take_all(kBlank).size();
         if (blanks > kMostBlanks) return false;
-        const bool leaf = tree_.first(element) == Node::none;
         if (*in_.at == '<' && in_.at[1] != '/') return begin_element();
         in_.take_all(kTextCharacter);
-        if (leaf)
+        if (leaf && filter_.keeps())
             tree_.set_leaf_text(element, tree_.keep({first, static_cast<std::size_t>(in_.at - first)}));
-        else if (in_.at != first + blanks)
+        else if (!leaf && in_.at != first + blanks)
             return false;
         return end_element();
     }
@@ -116,14 +116,20 @@ private:
         if (!in_.take("<") || !is(kNameStart, *in_.at) || open_.size() > kDeepest) return false;
         const std::string_view text = in_.take_all(kNameCharacter);
         if (text.size() > kLongestName) return false;
-        const std::uint32_t name = name_place(text);
-        const Node element = tree_.append(open_.empty() ? Node::none : open_.back(), NodeKind::element, name);
+        const std::uint32_t before_name = tree_.text_bytes(), name = name_place(text);
+        const Node parent = open_.empty() ? Node::none : open_.back().element;
+        const Node element = tree_.append(parent, NodeKind::element, name);
+        const std::uint32_t with_name = tree_.text_bytes();
         if (*in_.at == ' ' && !take_attribute(element)) return false;
+        filter_.begin(element, before_name, with_name);
+        if (!open_.empty()) open_.back().leaf = false;
         if (in_.take(">")) {
-            open_.push_back(element);
+            open_.push_back({element, true});
             return true;
         }
-        return in_.take("/>") && !open_.empty();
+        if (!in_.take("/>")) return false;
+        filter_.end(element);
+        return !open_.empty();
     }
     bool take_attribute(Node element) {
         const char* const first = in_.at++;
@@ -137,15 +143,17 @@ private:
         return true;
     }
     bool end_element() {
-        if (!in_.take("</") || !in_.take(tree_.name(open_.back())) || !in_.take(">")) return false;
+        const Node element = open_.back().element;
+        if (!in_.take("</") || !in_.take(tree_.name(element)) || !in_.take(">")) return false;
         open_.pop_back();
+        filter_.end(element);
         return kept_names_ <= kMostNames;
     }
     /** Most elements bear few names, which need to be kept only once. */
     std::uint32_t name_place(std::string_view name) {
         const auto byte = [&](std::size_t i) { return static_cast<unsigned char>(name[i]); };
         std::uint32_t& place = names_[(byte(0) * 7U + byte(name.size() - 1) * 31U + name.size()) % names_.size()];
-        if (tree_.kept(place) != name) {
+        if (!tree_.keeps(place, name)) {
             place = tree_.keep(name);
             kept_names_ += name.size();
         }
@@ -154,22 +162,28 @@ private:
 
     static constexpr std::size_t kLongestName = 50'000;  // that the parser takes
 
+    struct Open {
+        Node element;
+        bool leaf;
+    };
+
     Window in_;
     HeaderTree& tree_;
-    std::vector<Node> open_;                  // outermost first
+    TreeFilter filter_;
+    std::vector<Open> open_;                  // outermost first
     std::array<std::uint32_t, 256> names_{};  // places of names kept
     std::size_t kept_names_ = 0;              // their bytes
 };
 
 }  // namespace
 
-int scan_header(HeaderSource& source, HeaderTree& tree) {
+int scan_header(HeaderSource& source, HeaderTree& tree, ElementChoice* choice) {
     try {
         tree = HeaderTree{};
-        const bool whole = Scanner{source, tree}.run();
+        const bool whole = Scanner{source, tree, choice}.run();
         const int failed = source.status();
         return failed || whole ? failed : static_cast<int>(QUO_REFUSED);
-    } catch (const std::bad_alloc&) {
+    } catch (const std::exception&) {  // of the choice, or no memory
         return QUO_NO_MEMORY;
     }
 }

@@ -1,7 +1,9 @@
 #include "quorelxmllib/header_stream.h"
 
-#include <memory>
+#include <algorithm>
+#include <cstdint>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "quo_base/api.h"
@@ -10,8 +12,6 @@
 
 namespace quo {
 namespace {
-
-std::string_view text_of(const xmlChar* text) { return text ? reinterpret_cast<const char*>(text) : ""; }
 
 /** Chooses the elements that a field path leads to and hands over their texts. */
 class Follower : public ElementChoice {
@@ -26,35 +26,39 @@ public:
         names_.emplace_back(field);  // an empty name leads nowhere
     }
 
-    bool begins(const xmlNode& element, int level) override {
-        if (element.ns || level != matched_) return false;
-        const std::string_view name = text_of(element.name);
-        has_number_ = has_number_ || (level == 1 && name == "NumberOfChannels");
-        has_description_ = has_description_ || (level == 1 && name == "Description");
-        if (!leads_on(element, name)) return false;
+    void starts() override {
+        matched_ = 0;
+        has_number_ = has_description_ = false;
+        seen_before_ = std::max(seen_before_, std::exchange(seen_, 0));
+    }
+    bool begins(const HeaderTree& tree, Node element, int level) override {
+        if (level != matched_) return false;
+        has_number_ = has_number_ || (level == 1 && tree.is_named(element, "NumberOfChannels"));
+        has_description_ = has_description_ || (level == 1 && tree.is_named(element, "Description"));
+        if (!leads_on(tree, element)) return false;
         ++matched_;
         return matched_ == static_cast<int>(names_.size()) + 2;
     }
     void ends(int level) override {
         if (level == matched_ - 1) --matched_;
     }
-    void take(const HeaderTree& tree, Node element) override { see_(NodeText{tree, element}); }
+    void take(const HeaderTree& tree, Node element) override {
+        if (++seen_ > seen_before_) see_(NodeText{tree, element});
+    }
     [[nodiscard]] bool was_header() const { return has_number_ && has_description_; }
 
 private:
-    [[nodiscard]] bool leads_on(const xmlNode& element, std::string_view name) const {
-        if (matched_ == 0) return name == "QuorelXmlDoc";
-        if (matched_ > 1) return name == names_[static_cast<std::size_t>(matched_) - 2];
-        if (name != "Channel") return false;
-        const std::unique_ptr<xmlChar, decltype(xmlFree)> number{
-            xmlGetNoNsProp(&element, reinterpret_cast<const xmlChar*>("Number")), xmlFree};
-        return text_of(number.get()) == std::string_view{number_};
+    [[nodiscard]] bool leads_on(const HeaderTree& tree, Node element) const {
+        if (matched_ == 0) return tree.is_named(element, "QuorelXmlDoc");
+        if (matched_ > 1) return tree.is_named(element, names_[static_cast<std::size_t>(matched_) - 2]);
+        return tree.is_named(element, "Channel") && tree.attribute(element, "Number") == std::string_view{number_};
     }
 
     const NumberText number_;
     const std::function<void(std::string_view)>& see_;
     std::vector<std::string> names_;
-    int matched_ = 0;  // so many elements around the parser's place lead to the field
+    int matched_ = 0;                          // so many elements around the parser's place lead to the field
+    std::int64_t seen_ = 0, seen_before_ = 0;  // texts; those handed over when the file was read before
     bool has_number_ = false, has_description_ = false;
 };
 
@@ -65,7 +69,8 @@ int stream_texts(const char* file, int channel, std::string_view field,
     HeaderSource source;
     if (const int status = source.open(file)) return status;
     Follower follower{channel, field, see};
-    if (const int status = parse_header(source, follower)) return status;
+    HeaderTree tree;
+    if (const int status = parse_header(source, tree, nullptr, &follower)) return status;
     return follower.was_header() ? QUO_OK : QUO_REFUSED;
 }
 

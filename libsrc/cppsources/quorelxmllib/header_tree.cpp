@@ -213,11 +213,10 @@ bool HeaderTree::is_wasteful() const noexcept {
     return wasted_ > kLittle && wasted_ > all / 2;
 }
 
-void HeaderTree::clear() noexcept {
-    texts_.cut(1);
-    records_.cut(1);
-    record(Node::none).content = 0;
-    wasted_ = 0;
+void HeaderTree::forget_last(Node child, std::uint32_t text_bytes) noexcept {
+    record(parent(child)).content = 0;
+    records_.cut(static_cast<std::uint32_t>(child));
+    texts_.cut(text_bytes);
 }
 
 void HeaderTree::copy_children(Node from, HeaderTree& to, Node parent) const {

@@ -127,8 +127,14 @@ public:
     void set_attributes(Node element, std::uint32_t place) noexcept { record(element).attributes = place; }
     void set_in_namespace(Node element) noexcept { record(element).in_namespace = true; }
 
-    /** Forgets all nodes. */
-    void clear() noexcept;
+    /** How many bytes of texts are kept. */
+    [[nodiscard]] std::uint32_t text_bytes() const noexcept { return static_cast<std::uint32_t>(texts_.size()); }
+    /** Forgets the only child of its parent, all that was appended since, and the texts behind the first bytes. */
+    void forget_last(Node child, std::uint32_t text_bytes) noexcept;
+    /** Whether a place, which may have been forgotten since, holds this text. */
+    [[nodiscard]] bool keeps(std::uint32_t place, std::string_view text) const noexcept {
+        return place < texts_.size() && kept(place) == text;
+    }
     /** Whether what was removed and replaced takes more room than the rest. */
     [[nodiscard]] bool is_wasteful() const noexcept;
     /** The same document without what was removed and replaced; nodes are other ones in it. */

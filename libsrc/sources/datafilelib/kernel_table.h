@@ -1,6 +1,10 @@
 #ifndef QUO_KERNEL_TABLE_H
 #define QUO_KERNEL_TABLE_H
 
+#if defined(__SSE2__)
+#include <immintrin.h>
+#endif
+
 #include "datafilelib/sample_kernels.h"
 #include "sarutillib/ground/processor_level.h"
 
@@ -9,6 +13,7 @@ namespace quo {
 /** The loops by access, memory type and the file's cell type; null where an access does not convert the pair. */
 struct KernelTable {
     SampleKernel kernels[static_cast<int>(SampleAccess::kAnyRead) + 1][kCellTypes][kCellTypes];
+    void (*store_past_caches)(const char* from, char* to, std::size_t size) noexcept;
 };
 
 namespace kernels_any {

@@ -8,10 +8,6 @@
 #include <cerrno>
 #include <cstring>
 
-#if defined(__SSE2__)
-#include <emmintrin.h>
-#endif
-
 #include "diagnosticslib/call_frame.h"
 #include "sarutillib/ground/checked_size.h"
 
@@ -42,28 +38,6 @@ Offset line_distance(const RasterDescription& raster) {
 bool describes_lines(const RasterDescription& raster) {
     return raster.element_sizeof() > 0 && raster.NrOfPixelsPerLine >= 0 && raster.RowPrefix >= 0 &&
            raster.HeaderOffset >= 0;
-}
-
-/** Copies to memory that is not looked at soon; other threads may see it after order_stores(). */
-void store_past_caches(const char* from, char* to, std::size_t size) noexcept {
-#if defined(__SSE2__)
-    constexpr std::size_t kStore = sizeof(__m128i);
-    const std::size_t head = std::min(size, -reinterpret_cast<std::uintptr_t>(to) % kStore);
-    std::memcpy(to, from, head);
-    std::size_t done = head;
-    for (; done + kStore <= size; done += kStore) {
-        const __m128i value = _mm_loadu_si128(reinterpret_cast<const __m128i*>(from + done));
-        _mm_stream_si128(reinterpret_cast<__m128i*>(to + done), value);
-    }
-    std::memcpy(to + done, from + done, size - done);
-#else
-    std::memcpy(to, from, size);
-#endif
-}
-void order_stores() noexcept {
-#if defined(__SSE2__)
-    _mm_sfence();
-#endif
 }
 
 /** Moves a region chunk by chunk. */

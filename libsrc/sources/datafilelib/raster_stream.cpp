@@ -9,6 +9,10 @@
 namespace quo {
 namespace {
 
+// Copies as large as this start on their way to the disk at once: who waits for the disk at the end, as for a new
+// raster, waits less.
+constexpr ssize_t kLargeCopy = ssize_t{1} << 20;
+
 int flags_of(RasterStream::Mode mode) {
     switch (mode) {
         case RasterStream::Mode::kRead:
@@ -77,7 +81,10 @@ std::size_t RasterStream::copy_to(std::int64_t offset, const RasterStream& to, s
                                   std::size_t size) const noexcept {
     const Transfer moved = move_all(size, [&](std::size_t done, std::size_t left) {
         off_t from_here = offset + static_cast<off_t>(done), to_there = place + static_cast<off_t>(done);
-        return copy_file_range(descriptor_, &from_here, to.descriptor_, &to_there, left, 0);
+        const ssize_t copied = copy_file_range(descriptor_, &from_here, to.descriptor_, &to_there, left, 0);
+        if (copied >= kLargeCopy)
+            (void)sync_file_range(to.descriptor_, to_there - copied, copied, SYNC_FILE_RANGE_WRITE);
+        return copied;
     });
     errno = 0;
     return moved.bytes;

@@ -21,6 +21,15 @@ SampleKernel find_kernel(SampleAccess access, int file_type, int memory_type) no
     return kernel_table(processor_level()).kernels[static_cast<int>(access)][memory_type][file_type];
 }
 
+void store_past_caches(const char* from, char* to, std::size_t size) noexcept {
+    kernel_table(processor_level()).store_past_caches(from, to, size);
+}
+void order_stores() noexcept {
+#if defined(__SSE2__)
+    _mm_sfence();
+#endif
+}
+
 std::size_t sample_size(int cell_type) noexcept { return is_cell_type(cell_type) ? kSizes[cell_type] : 0; }
 
 bool is_complex_type(int cell_type) noexcept { return is_cell_type(cell_type) && cell_type % 2 == 0; }

@@ -24,6 +24,10 @@ enum class SampleAccess : unsigned char {
  * access does not convert this pair. */
 SampleKernel find_kernel(SampleAccess access, int file_type, int memory_type) noexcept;
 
+/** Copies to memory that is not looked at soon; other threads may see it after order_stores(). */
+void store_past_caches(const char* from, char* to, std::size_t size) noexcept;
+void order_stores() noexcept;
+
 /** Cell types have the codes 0 to kCellTypes - 1. */
 inline constexpr int kCellTypes = 10;
 /** Bytes of a sample, 0 for a code that is not a cell type. */

@@ -24,7 +24,7 @@ constexpr int kDefaultLevel = 1;
 /** A message formatted from a variable argument list, cut to the room. */
 class Message {
 public:
-    Message(const char* format, std::va_list arguments) noexcept {
+    [[gnu::format(printf, 2, 0)]] Message(const char* format, std::va_list arguments) noexcept {
         if (!format || std::vsnprintf(text_, sizeof text_, format, arguments) < 0) text_[0] = '\0';
     }
     [[nodiscard]] const char* text() const noexcept { return text_; }

@@ -1,15 +1,13 @@
 #include "signallib/fft_engine.h"
 
-#include <dlfcn.h>
-
 #include <atomic>
-#include <cstdlib>
 #include <memory>
 #include <mutex>
 #include <string>
 
 #include "diagnosticslib/errno_kept.h"
 #include "sarutillib/ground/bounded_text.h"
+#include "sarutillib/ground/own_module.h"
 #include "signallib/own_fft/fft_plans.h"
 
 #if defined(__x86_64__) || defined(__i386__)
@@ -18,12 +16,6 @@
 
 namespace quo {
 namespace {
-
-// Secure: a program with raised rights does not load what its caller names.
-const char* setting(const char* name) {
-    const char* value = secure_getenv(name);
-    return value && *value ? value : nullptr;
-}
 
 /** MKL picks slow generic code on processors of other makers, where FFTW is faster. */
 bool is_makers_processor() {
@@ -36,22 +28,7 @@ bool is_makers_processor() {
 #endif
 }
 
-FftEngine* open_module(const std::string& file) {
-    void* module = dlopen(file.c_str(), RTLD_NOW | RTLD_LOCAL);
-    if (!module) return nullptr;
-    const auto entry = reinterpret_cast<FftwEntry>(dlsym(module, kFftwEntryName));
-    FftEngine* engine = entry ? entry(kFftInterfaceVersion) : nullptr;
-    if (!engine) dlclose(module);  // else it stays for good, as do its plans
-    return engine;
-}
-
-/** Folder of the library or program that holds this code, with a slash; empty where it cannot be told. */
-std::string own_folder() {
-    Dl_info info{};
-    if (!dladdr(reinterpret_cast<const void*>(&note_no_fft_engine), &info) || !info.dli_fname) return {};
-    const std::string file = info.dli_fname;
-    return file.substr(0, file.rfind('/') + 1);  // a name without a slash gives an empty one
-}
+FftEngine* engine_of(FftwEntry entry) { return entry(kFftInterfaceVersion); }
 
 FftEngine* mkl() { return load_mkl_engine(setting("QUO_MKL_LIBRARY")); }
 FftEngine* fftw() { return load_fftw_engine(setting("QUO_FFTW_MODULE")); }
@@ -74,11 +51,8 @@ thread_local char error_text[512];
 }  // namespace
 
 FftEngine* load_fftw_engine(const char* file) noexcept try {
-    if (file) return open_module(file);
-    const std::string folder = own_folder();
-    if (folder.empty()) return nullptr;
-    FftEngine* engine = open_module(folder + "quo_base/libquo_base_fftw.so");
-    return engine ? engine : open_module(folder + "libquo_base_fftw.so");
+    return file ? use_module<FftwEntry>(file, kFftwEntryName, engine_of)
+                : use_own_module<FftwEntry>("libquo_base_fftw.so", kFftwEntryName, engine_of);
 } catch (...) {
     return nullptr;  // out of memory
 }

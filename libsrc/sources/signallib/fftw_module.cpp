@@ -15,6 +15,11 @@
 
 namespace {
 
+// For whoever finds the module alone: strings libquo_base_fftw.so
+[[gnu::used]] constexpr char kLicence[] =
+    "This module contains FFTW, Copyright (c) 2003, 2007-14 Matteo Frigo, Massachusetts Institute of Technology, "
+    "and is under the GNU General Public License, version 3 or later.";
+
 using quo::FftBatch;
 using quo::FftEngine;
 using quo::FftFailure;

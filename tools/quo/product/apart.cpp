@@ -2,11 +2,14 @@
 
 #include <filesystem>
 
+#include "common/same_file.h"
 #include "failure.h"
 #include "product.h"
 
 namespace tool {
 namespace {
+
+using files::same_file;
 
 /** What a link leads to is replaced where it lies. A file without a description of its own is none of ours: it may
  * be a measurement that an import has left in its place. */
@@ -19,11 +22,6 @@ void require_own_raster(const std::string& out) {
 }
 
 }  // namespace
-
-bool same_file(const std::string& a, const std::string& b) {
-    std::error_code error;
-    return std::filesystem::is_regular_file(a, error) && std::filesystem::equivalent(a, b, error);
-}
 
 std::vector<std::string> raster_files(const std::string& raster) { return {raster, raster + ".hdr"}; }
 

@@ -6,9 +6,6 @@
 
 namespace tool {
 
-/** Whether two names lead to one regular file, through links of either kind or other ways to write a path. */
-bool same_file(const std::string& a, const std::string& b);
-
 /** The raster and its side file. */
 std::vector<std::string> raster_files(const std::string& raster);
 /** The header, and its raster where the header is named like a side file. */

@@ -83,7 +83,7 @@ nlohmann::ordered_json box_of(const Ring& ring) {
 }  // namespace
 
 Outline outline_of(const std::string& header, GeneralSAR& product) {
-    Ring ring = corners_of(product);
+    Ring ring = corners_of(header, product);
     const std::string uneven = product.GSexists(gsOrbit) ? uneven_vectors(product.orbit) : "";
     if (ring.empty() && !uneven.empty()) throw Failure(header + ": " + uneven);
     if (ring.empty())

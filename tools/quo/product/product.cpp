@@ -2,9 +2,11 @@
 
 #include <cmath>
 
+#include "date.h"
 #include "document.h"
 #include "failure.h"
 #include "quo_base/derived_raster.h"
+#include "quorelxmllib/element_path.h"
 #include "scene.h"
 
 namespace tool {
@@ -34,19 +36,19 @@ const char* section_of(GeneralSAR& product, GSObject object) {
     return element != nullptr ? element->section : "";
 }
 
-const parElement* element_at(GeneralSAR& product, std::string_view field) {
+const parElement* Fields::at(std::string_view field) const {
     for (int i = gsRoi; i < GeneralSAR::kObjects; ++i) {
-        if (const parElement* element = product.GSelement(static_cast<GSObject>(i), field)) return element;
+        if (const parElement* element = product_.GSelement(static_cast<GSObject>(i), field)) return element;
     }
-    return nullptr;
+    return quo::element_at(grid_, field);
 }
 
-bool is_numeric_field(GeneralSAR& product, std::string_view field) {
+bool Fields::is_numeric(std::string_view field) const {
     // Polynomials and corner points stand in sections of their own, as many as there are.
     for (const char* nested : {"/pol", "/trg0_s", "/taz0_s", "/Point"}) {
         if (field.ends_with(nested)) return true;
     }
-    const parElement* element = element_at(product, field);
+    const parElement* element = at(field);
     return element != nullptr && element->type != parElement::typeString;
 }
 
@@ -66,6 +68,24 @@ bool is_told(std::string_view text) {
            !text.ends_with(" UNDEFINED");
 }
 
+Told::Told(const GeneralSAR& product) {
+    const DataSetInfo_Obj& info = product.dataSetInfo;
+    const auto text = [&](const char* field) {
+        return product.GSexists(gsDataSetInfo) && is_told(field) ? std::string{field} : std::string{};
+    };
+    mission = text(info.SensorName);
+    mode = text(info.AcquisitionMode);
+    swath = text(info.Swath);
+    polarization = text(info.Polarization);
+    orbit_number = text(info.OrbitNumber);
+    image_type = text(info.ImageType);
+    scene = text(info.SceneID);
+    if (product.GSexists(gsOrbit)) direction = product.orbit.isAscending() ? "ascending" : "descending";
+    if (!product.GSexists(gsRoi) || product.roi.Roi.isNULL() != 0) return;
+    start_time = iso_text(product.roi.Roi.SlowStartTime);
+    stop_time = iso_text(last_line_time(product.roi.Roi));
+}
+
 void read_region(const std::string& header, ROI_Obj& region) {
     const bool found = region.read_roi(header.c_str(), "ROI") == QUO_OK && region.isNULL() == 0;
     const double sum = region.FastStartTime + region.FastTimeLength + region.SlowStartTime + region.SlowTimeLength;
@@ -76,31 +96,36 @@ double last_line_time(const ROI_Obj& region) {
     return region.SlowStartTime + region.SlowTimeDelta * (region.Lines - 1);
 }
 
-std::vector<Corner> orbit_corners(GeneralSAR& product) {
-    const ROI_Obj& region = product.roi.Roi;
-    for (const GSObject needed : {gsOrbit, gsRoi, gsDataSetInfo}) {  // the last tells the look side
-        if (!product.GSexists(needed)) return {};
+std::vector<Corner> orbit_corners(const std::string& header, GeneralSAR& product) {
+    if (!product.GSexists(gsOrbit) || !product.GSexists(gsDataSetInfo)) return {};  // which tells the look side
+    if (!uneven_vectors(product.orbit).empty()) return {};
+    ImageGrid_Obj grid;
+    int lines = 0, samples = 0;
+    const RasterDescription* const raster = described_raster(product);
+    if (raster != nullptr && read_image_grid(header.c_str(), product, grid) == QUO_OK) {
+        lines = raster->NrOfLinesPerImage;
+        samples = raster->NrOfPixelsPerLine;
+    } else if (const ROI_Obj& region = product.roi.Roi;
+               product.GSexists(gsRoi) && region.isNULL() == 0 && grid.setRegion(region) == QUO_OK) {
+        lines = region.Lines;
+        samples = region.Samples;
     }
-    if (region.isNULL() != 0 || !uneven_vectors(product.orbit).empty()) return {};
-    // Of the last line and sample themselves: the region's lengths lead to the ones after them.
-    const double first_s = region.SlowStartTime, near_s = region.FastStartTime;
-    const double last_s = last_line_time(region);
-    const double far_s = near_s + region.FastTimeDelta * (region.Samples - 1);
-    const std::pair<double, double> places[] = {
-        {first_s, near_s}, {last_s, near_s}, {last_s, far_s}, {first_s, far_s}};
-    std::vector<Corner> corners;
-    for (const auto& [azimuth_s, range_s] : places) {
-        Corner corner{};
-        if (product.orbit.SVGetLatLon(azimuth_s, range_s, &corner.latitude_deg, &corner.longitude_deg) != 0)
+    if (lines == 0) return {};
+    const double last_line = lines - 1.0, last_sample = samples - 1.0;
+    const double at_line[] = {0.0, last_line, last_line, 0.0}, at_sample[] = {0.0, 0.0, last_sample, last_sample};
+    double azimuth_s[4], range_s[4];
+    if (grid.pixelTimes({4, at_line, at_sample}, {azimuth_s, range_s}) != QUO_OK) return {};
+    std::vector<Corner> corners(4);
+    for (std::size_t i = 0; i < corners.size(); ++i)
+        if (product.orbit.SVGetLatLon(azimuth_s[i], range_s[i], &corners[i].latitude_deg,
+                                      &corners[i].longitude_deg) != QUO_OK)
             return {};
-        corners.push_back(corner);
-    }
     return corners;
 }
 
-std::vector<Corner> corners_of(GeneralSAR& product) {
+std::vector<Corner> corners_of(const std::string& header, GeneralSAR& product) {
     std::vector<Corner> corners = grid_corners(product);
-    return corners.empty() ? orbit_corners(product) : corners;
+    return corners.empty() ? orbit_corners(header, product) : corners;
 }
 
 std::optional<std::string> raster_of(const std::string& header) {

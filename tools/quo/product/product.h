@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "quo_base/generalSAR.h"
+#include "quo_base/image_grid.h"
 
 namespace tool {
 
@@ -17,13 +18,31 @@ void read_product(const std::string& header, GeneralSAR& product);
 const GeneralSAR_Base& elements_of(GeneralSAR& product, GSObject object);
 /** The section that these stand in. */
 const char* section_of(GeneralSAR& product, GSObject object);
-/** The same, or null, for the element at a path such as "SamplingConstants/prf_hz". */
-const parElement* element_at(GeneralSAR& product, std::string_view field);
-/** Whether a field is known to hold numbers. */
-bool is_numeric_field(GeneralSAR& product, std::string_view field);
+
+/** The fields that headers have, with what new objects hold in them. */
+class Fields {
+public:
+    /** The element at a path such as "SamplingConstants/prf_hz"; null where no object has it. */
+    const parElement* at(std::string_view field) const;
+    /** Whether a field is known to hold numbers. */
+    bool is_numeric(std::string_view field) const;
+
+private:
+    GeneralSAR product_;
+    ImageGrid_Obj grid_;
+};
 
 /** Whether a text of the description tells something: it is none of the marks of a missing one. */
 bool is_told(std::string_view text);
+
+/** What a header tells of a product to those who look for one; texts are empty where it tells nothing. */
+struct Told {
+    explicit Told(const GeneralSAR& product);
+
+    std::string mission, mode, swath, polarization, orbit_number, image_type, scene;
+    std::string direction;              ///< of the orbit: "ascending", "descending"
+    std::string start_time, stop_time;  ///< of the region's first and last line, ISO 8601 in UTC
+};
 
 /** Reads a header's section ROI. Throws Failure where it is not there or holds no sample. */
 void read_region(const std::string& header, ROI_Obj& region);
@@ -36,9 +55,9 @@ struct Corner {
 };
 /** The corners of a product around its edge, from the corner grid, else as orbit_corners() finds them. Empty where
  * neither can be had. */
-std::vector<Corner> corners_of(GeneralSAR& product);
-/** The same from orbit, region and look side alone: of the first and the last line and sample. */
-std::vector<Corner> orbit_corners(GeneralSAR& product);
+std::vector<Corner> corners_of(const std::string& header, GeneralSAR& product);
+/** The same from orbit, pixel grid or region, and look side alone: of the first and the last line and sample. */
+std::vector<Corner> orbit_corners(const std::string& header, GeneralSAR& product);
 /** The same from the corner grid alone. */
 std::vector<Corner> grid_corners(const GeneralSAR& product);
 

@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <array>
 #include <cctype>
-#include <charconv>
 #include <cmath>
 #include <complex>
 #include <filesystem>
@@ -13,6 +12,7 @@
 
 #include "failure.h"
 #include "interrupt.h"
+#include "number.h"
 
 namespace tool {
 namespace {
@@ -25,10 +25,7 @@ template <typename T>
 constexpr bool kIsComplex = std::is_same_v<T, fcomplex> || std::is_same_v<T, dcomplex>;
 
 std::optional<int> index_of(std::string_view text, int otherwise) {
-    if (text.empty()) return otherwise;
-    int value = 0;
-    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
-    return error == std::errc{} && end == text.data() + text.size() ? std::optional{value} : std::nullopt;
+    return text.empty() ? otherwise : whole_number(text);
 }
 
 // 8-bit samples, which the library's typed access leaves to its callers; they have no byte order.

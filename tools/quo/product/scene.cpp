@@ -10,6 +10,7 @@
 
 #include "document.h"
 #include "failure.h"
+#include "generalSAR/orbit/orbit_check.h"
 #include "number.h"
 #include "pixels.h"
 #include "product.h"
@@ -85,9 +86,7 @@ std::string uneven_vectors(const GeneralSAROrbit& orbit) {
     std::string causes;
     if (orbit.SVCheck(findings) != 0) return "the state vectors cannot be checked";
     for (const SVFinding& finding : findings) {
-        const bool uneven = finding.problem == SVFinding::kGap || finding.problem == SVFinding::kDuplicate ||
-                            finding.problem == SVFinding::kOrder;
-        if (uneven) causes += (causes.empty() ? "" : "; ") + std::string{finding.text};
+        if (quo::is_uneven(finding)) causes += (causes.empty() ? "" : "; ") + std::string{finding.text};
     }
     return causes;
 }

@@ -1,6 +1,7 @@
 #ifndef QUO_TOOL_DATE_H
 #define QUO_TOOL_DATE_H
 
+#include <cstdint>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -14,13 +15,19 @@ namespace tool {
  * ...16.781408. */
 std::optional<std::string> date_text(double seconds);
 
+/** How a verb writes dates. */
+enum class DateForm : std::uint8_t { kHeader, kIso };
+/** The date of such a time: the text above, or as ISO 8601 to the microsecond with the Z of UTC behind it. */
+std::optional<std::string> date_text(double seconds, DateForm form);
+/** The time as a date in ISO 8601, or as the number where it has none. */
+std::string iso_or_number(double seconds);
+
 /** The ISO 8601 text of such a time, to the microsecond; empty where there is none. */
 std::string iso_text(double seconds);
 
-/** Seconds since 1985 of a date text or an ISO 8601 text; nothing for another. */
-std::optional<double> date_of(std::string_view text);
-
-/** Seconds since 1985 of a number, a date text or an ISO 8601 text. Throws WrongUse where the text is neither. */
+/** Seconds since 1985 of a number, a date text or an ISO 8601 text; nothing for another. */
+std::optional<double> time_of(std::string_view text);
+/** The same; throws WrongUse for another. */
 double seconds_of(const std::string& text);
 
 }  // namespace tool

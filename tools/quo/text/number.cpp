@@ -3,6 +3,8 @@
 #include <charconv>
 #include <cmath>
 
+#include "failure.h"
+
 namespace tool {
 namespace {
 
@@ -59,6 +61,17 @@ std::optional<double> finite_number(std::string_view text) {
     const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
     if (error != std::errc{} || end != text.data() + text.size() || !std::isfinite(value)) return std::nullopt;
     return value;
+}
+
+double finite_number(std::string_view text, const char* option) {
+    if (const auto number = finite_number(text)) return *number;
+    throw WrongUse(std::string{option} + " " + std::string{text} + ": no finite number");
+}
+
+std::optional<int> whole_number(std::string_view text) {
+    int value = 0;
+    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
+    return error == std::errc{} && end == text.data() + text.size() ? std::optional{value} : std::nullopt;
 }
 
 std::optional<std::pair<double, double>> number_pair(std::string_view text, char separator) {

@@ -30,6 +30,11 @@ std::string_view trimmed(std::string_view text);
  * and for infinity and not-a-number, which no computation here can use. */
 std::optional<double> finite_number(std::string_view text);
 
+/** The same; throws WrongUse with the option's name for another text. */
+double finite_number(std::string_view text, const char* option);
+/** The whole number that the whole text is; nothing for anything else, and beyond an int. */
+std::optional<int> whole_number(std::string_view text);
+
 /** The two numbers of a text such as "4x1", with a separator in between; nothing for anything else. */
 std::optional<std::pair<double, double>> number_pair(std::string_view text, char separator);
 

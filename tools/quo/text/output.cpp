@@ -74,7 +74,25 @@ void Output::commit() {
     flush();
     if (!file_) return;
     if (!file_->commit()) fail();
+    say_in_place();
+}
+
+void Output::say_in_place() const {
     if (file_->in_place()) complain(name_ + ": written in place, no other file can be put there");
+}
+
+void commit_together(Output& first, Output& second) {
+    first.flush();
+    second.flush();
+    if (!first.file_ || !second.file_) {  // what is written to directly has arrived
+        first.commit();
+        second.commit();
+        return;
+    }
+    if (!quo::commit_pair(*first.file_, *second.file_))
+        throw Failure(first.name_ + ", " + second.name_ + ": cannot be written together: " + system_cause());
+    first.say_in_place();
+    second.say_in_place();
 }
 
 void write_output(const std::string& name, std::string_view text) {

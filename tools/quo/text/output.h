@@ -31,8 +31,11 @@ public:
     void commit();
 
 private:
+    friend void commit_together(Output& first, Output& second);
+
     void put(std::string_view rest);
     [[noreturn]] void fail() const;
+    void say_in_place() const;
 
     std::string name_;
     std::unique_ptr<quo::AtomicFile> file_;  // none where the output is written to directly
@@ -40,6 +43,9 @@ private:
     bool terminal_ = false;
     std::string pending_;
 };
+
+/** Two results that belong together are complete: both files appear, or none does. Throws Failure. */
+void commit_together(Output& first, Output& second);
 
 /** Writes a whole result in one step. Throws Failure. */
 void write_output(const std::string& name, std::string_view text);

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "date.h"
 #include "failure.h"
 #include "number.h"
 
@@ -27,6 +28,17 @@ std::size_t quoted_length(std::string_view text) {
 
 }  // namespace
 
+std::optional<std::string> read_value(std::string_view field, std::string_view name, double& value) {
+    const bool time = name == kAzimuthTime;
+    const auto found = time ? time_of(unquoted(field)) : finite_number(field);
+    if (found) {
+        value = *found;
+        return std::nullopt;
+    }
+    return std::string{name} + " is \"" + std::string{field} + "\", " +
+           (time ? "neither a number nor a date such as 2022-01-04T17:05:58.5Z" : "not a number");
+}
+
 bool split_fields(std::string_view line, std::vector<std::string_view>& fields) {
     fields.clear();
     while (true) {
@@ -50,9 +62,11 @@ Table::Table(const std::string& name) : input_{name} {
         if (line_.front() != '#') break;
         comments_.emplace_back(trimmed(std::string_view{line_}.substr(1)));
     }
-    if (line_.empty() || line_.front() == '#') throw Failure(input_.name() + ": no line of column names");
+    if (line_.empty() || line_.front() == '#')
+        throw Failure(input_.name() + ": no line of column names; put one first");
+    names_at_ = input_.line_number();
     row_.take(line_, input_.line_number());
-    if (!row_.well_quoted()) throw Failure(place() + ": a quote is not closed");
+    if (!row_.well_quoted()) throw Failure(place() + ": " + *row_.defect(0));
     for (const std::string_view field : row_.fields()) columns_.emplace_back(unquoted(field));
 }
 
@@ -60,13 +74,13 @@ std::optional<std::size_t> Table::find(std::string_view column) const {
     const auto found = std::find(columns_.begin(), columns_.end(), column);
     if (found == columns_.end()) return std::nullopt;
     if (std::find(found + 1, columns_.end(), column) != columns_.end())
-        throw Failure(input_.name() + ": two columns are named " + std::string{column});
+        throw Failure(place_of_names() + ": two columns are named " + std::string{column} + "; rename one");
     return static_cast<std::size_t>(found - columns_.begin());
 }
 
 std::size_t Table::need(std::string_view column) const {
     if (const auto index = find(column)) return *index;
-    throw Failure(input_.name() + ": no column " + std::string{column});
+    throw Failure(place_of_names() + ": no column " + std::string{column} + " among the names");
 }
 
 bool Table::next() {
@@ -86,7 +100,7 @@ std::optional<Rows> Table::next_rows(std::size_t most) {
 }
 
 std::optional<std::string> Row::defect(std::size_t columns) const {
-    if (!well_quoted_) return "a quote is not closed";
+    if (!well_quoted_) return "a quote is not closed; those inside a value are doubled";
     if (fields_.size() != columns)
         return std::to_string(fields_.size()) + " values for " + std::to_string(columns) + " columns";
     return std::nullopt;
@@ -95,13 +109,9 @@ std::optional<std::string> Row::defect(std::size_t columns) const {
 std::vector<double> Table::numbers(std::span<const std::size_t> columns) const {
     if (const auto wrong = row_.defect(columns_.size())) throw Failure(place() + ": " + *wrong);
     std::vector<double> values;
-    for (const std::size_t column : columns) {
-        const auto number = finite_number(row_.fields()[column]);
-        if (!number)
-            throw Failure(place() + ": " + columns_[column] + " is \"" + std::string{row_.fields()[column]} +
-                          "\", not a number");
-        values.push_back(*number);
-    }
+    for (const std::size_t column : columns)
+        if (const auto wrong = read_value(row_.fields()[column], columns_[column], values.emplace_back()))
+            throw Failure(place() + ": " + *wrong);
     return values;
 }
 

@@ -14,6 +14,14 @@
 
 namespace tool {
 
+/** Name of the column of azimuth times: seconds since 1985, or dates. All other columns that are computed with
+ * hold numbers. */
+inline constexpr const char* kAzimuthTime = "azimuth_time_s";
+
+/** Reads the value in a field of the column `name`. Returns what is wrong with it, in words; `value` stays then.
+ */
+std::optional<std::string> read_value(std::string_view field, std::string_view name, double& value);
+
 /** Takes a line of comma-separated values apart. The fields point into the line and keep their quotes.
  *
  * @return false where a quote is left open or something follows a closing quote; the rest of the line is then the
@@ -90,11 +98,14 @@ public:
     const Row& row() const { return row_; }
     /** The rows of the next lines, so many at most; nothing at the end. row() stays behind. */
     std::optional<Rows> next_rows(std::size_t most);
-    /** The row's numbers in some columns; throws Failure for a row with a defect, or that lacks one of them. */
+    /** The row's values in some columns; throws Failure for a row with a defect, or that lacks one of them. */
     std::vector<double> numbers(std::span<const std::size_t> columns) const;
     /** "file: line 17", for messages about a row: the present one, unless told. */
     std::string place() const;
     std::string place(std::int64_t line_number) const;
+
+    /** The same about the column names. */
+    std::string place_of_names() const { return place(names_at_); }
 
     const LineReader& input() const { return input_; }
 
@@ -102,6 +113,7 @@ private:
     LineReader input_;
     std::vector<std::string> columns_, comments_;
     std::string line_;
+    std::int64_t names_at_ = 0;
     Row row_;
 };
 

@@ -44,7 +44,7 @@ public:
 class Scaling {
 public:
     explicit Scaling(const ConvertOptions& options)
-        : scale_{number_of("--scale", options.scale)}, offset_{number_of("--offset", options.offset)} {
+        : scale_{finite_number(options.scale, "--scale")}, offset_{finite_number(options.offset, "--offset")} {
         if (scale_ == 0.0) throw WrongUse("--scale 0: would leave nothing of the samples");
     }
 
@@ -55,12 +55,6 @@ public:
     }
 
 private:
-    static double number_of(const char* option, const std::string& text) {
-        const auto number = finite_number(text);
-        if (!number) throw WrongUse(std::string{option} + " " + text + ": no finite number");
-        return *number;
-    }
-
     double scale_, offset_;
 };
 

@@ -4,11 +4,12 @@
 #include <nlohmann/json.hpp>
 
 #include "commands.h"
+#include "date.h"
 #include "document.h"
 #include "product.h"
 #include "quo_base/SARpolynomials.h"
 #include "quo_base/quorelxml_v2.h"
-#include "residuals.h"
+#include "sarutillib/ground/residuals.h"
 #include "scene.h"
 
 namespace tool {
@@ -16,7 +17,7 @@ namespace {
 
 struct DeriveOptions {
     std::string header;
-    std::vector<double> region;  // range start and length, azimuth start and length, s
+    std::vector<std::string> region;  // range start and length, azimuth start and length
     std::vector<std::string> what;
     bool in_both_times = false, replace = false, json = false;
 };
@@ -49,7 +50,7 @@ struct Derived {
 struct Result {
     std::array<bool, kQuantities> wanted{}, kept{};
     Derived polynomials;
-    std::array<Residuals, kQuantities> residuals;
+    std::array<quo::Residuals, kQuantities> residuals;
 };
 
 std::array<std::int32_t, kQuantities> counts_of(const polySAR& set) {
@@ -81,10 +82,11 @@ ROI_Obj& region_of(const DeriveOptions& options, ROI_Obj& region) {
         read_region(options.header, region);
         return region;
     }
-    region.FastStartTime = options.region[0];
-    region.FastTimeLength = options.region[1];
-    region.SlowStartTime = options.region[2];
-    region.SlowTimeLength = options.region[3];
+    constexpr const char* kOption = "--region";
+    region.FastStartTime = finite_number(options.region[0], kOption);
+    region.FastTimeLength = finite_number(options.region[1], kOption);
+    region.SlowStartTime = seconds_of(options.region[2]);
+    region.SlowTimeLength = finite_number(options.region[3], kOption);
     const bool positive = region.FastStartTime > 0.0 && region.FastTimeLength > 0.0 && region.SlowTimeLength > 0.0;
     if (!positive || !std::isfinite(region.GetDownRight().FastTime + region.GetDownRight().SlowTime))
         throw WrongUse("a region needs a range start and lengths above 0");
@@ -263,9 +265,10 @@ void add_derive(Command& program) {
     auto [command, options] = add_verb(program, "derive", kAboutText, derive);
     command.details(kDetails);
     command.needs("HEADER", options.header, "Product header, which is changed");
-    command.takes("--region", options.region,
-                  "Range start and length, azimuth start and length in s, else the header's section ROI",
-                  {.values = 4});
+    command.takes(
+        "--region", options.region,
+        "Range start and length, azimuth start (a time or a date) and length in s, else the header's section ROI",
+        {.values = 4});
     command.takes("--what", options.what, "What to derive, else all that is missing",
                   {.one_of = {"fr", "angles", "ground"}});
     command.flag("--grid", options.in_both_times, "Angles and ground range in both times");

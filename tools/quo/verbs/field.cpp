@@ -24,16 +24,13 @@ void require_field(const std::string& field) {
 
 /** The unit of a field that an object registers; empty where it has none. */
 std::string unit_of(const std::string& field) {
-    GeneralSAR product;
-    const parElement* const element = element_at(product, field);
+    const Fields fields;
+    const parElement* const element = fields.at(field);
     return element ? element->unit : "";
 }
 
 // A field that no object registers may be anything.
-bool is_number(const std::string& field) {
-    GeneralSAR product;
-    return is_numeric_field(product, field);
-}
+bool is_number(const std::string& field) { return Fields{}.is_numeric(field); }
 
 nlohmann::json as_json(const std::string& text, bool numeric) {
     const auto number = numeric ? finite_number(text) : std::nullopt;
@@ -101,10 +98,10 @@ int get_field(const FieldOptions& options) {
 // What would make the field say something that makes no sense. Fields that no object registers may hold anything
 // but, where polynomials and corner points are meant, words.
 std::string defect_of(const FieldOptions& options) {
-    GeneralSAR product;
-    if (const parElement* element = element_at(product, options.field))
+    const Fields fields;
+    if (const parElement* element = fields.at(options.field))
         return values_defect(*element, *element, options.values);
-    if (!is_numeric_field(product, options.field)) return "";
+    if (!fields.is_numeric(options.field)) return "";
     for (const std::string& value : options.values)
         if (!finite_number(value)) return "\"" + value + "\" is no finite number";
     return "";

@@ -4,7 +4,7 @@
 #include "commands.h"
 #include "quo_base/MatrixAlgebraANSI.h"
 #include "quo_base/api.h"
-#include "residuals.h"
+#include "sarutillib/ground/residuals.h"
 #include "table.h"
 
 namespace tool {
@@ -44,7 +44,7 @@ struct Fit {
     double centre = 0.0, scale = 1.0;
     std::vector<double> coefficients;  // ascending
     LsqSummary summary{};
-    Residuals residuals;
+    quo::Residuals residuals;
 
     int degree() const { return static_cast<int>(coefficients.size()) - 1; }
     double at(double x) const { return polval(coefficients.data(), degree(), (x - centre) / scale); }

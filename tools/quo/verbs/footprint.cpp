@@ -1,7 +1,8 @@
 #include <nlohmann/json.hpp>
+#include <string>
+#include <utility>
 
 #include "commands.h"
-#include "date.h"
 #include "outline.h"
 #include "product.h"
 
@@ -10,21 +11,17 @@ namespace {
 
 /** What users search outlines by; of what the header does not tell nothing. */
 nlohmann::ordered_json properties_of(const std::string& header, const GeneralSAR& product) {
-    const DataSetInfo_Obj& info = product.dataSetInfo;
-    nlohmann::ordered_json properties{{"header", header}, {"scene", info.SceneID}};
-    const auto add = [&](const char* key, const char* text) {
-        if (product.GSexists(gsDataSetInfo) && is_told(text)) properties[key] = text;
-    };
-    add("mission", info.SensorName);
-    add("mode", info.AcquisitionMode);
-    add("polarization", info.Polarization);
-    add("orbit_number", info.OrbitNumber);
-    if (product.GSexists(gsRoi) && product.roi.Roi.isNULL() == 0) {
-        properties["start_time"] = iso_text(product.roi.Roi.SlowStartTime);
-        properties["stop_time"] = iso_text(last_line_time(product.roi.Roi));
-    }
-    if (product.GSexists(gsOrbit))
-        properties["orbit_direction"] = product.orbit.isAscending() ? "ascending" : "descending";
+    const Told told{product};
+    const auto utc = [](const std::string& time) { return time.empty() ? time : time + "Z"; };
+    nlohmann::ordered_json properties{{"header", header}, {"scene", product.dataSetInfo.SceneID}};
+    for (const auto& [key, text] : {std::pair{"mission", told.mission},
+                                    {"mode", told.mode},
+                                    {"polarization", told.polarization},
+                                    {"orbit_number", told.orbit_number},
+                                    {"start_time", utc(told.start_time)},
+                                    {"stop_time", utc(told.stop_time)},
+                                    {"orbit_direction", told.direction}})
+        if (!text.empty()) properties[key] = text;
     return properties;
 }
 

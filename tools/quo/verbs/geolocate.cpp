@@ -33,7 +33,6 @@ struct Input {
     const char* name;
     double lowest = -std::numeric_limits<double>::max();
     double highest = std::numeric_limits<double>::max();
-    bool time = false;  // a date will do
 };
 
 /** Points that are solved together: what was read of them, and what is found. */
@@ -84,19 +83,16 @@ void to_ground(const Scene& scene, GeneralSAROrbit& /*own*/, Points& points) {
     ground.status = points.status.data();
     require_solved(scene.orbit().sat2earth(samples, ground));
     for (std::size_t i = 0; i < points.count(); ++i)
-        if (!scene.covers(time_s[i])) points.status[i] = QUO_NOT_SEEN;
+        if (!std::isnan(time_s[i]) && !scene.covers(time_s[i])) points.status[i] = QUO_NOT_SEEN;
 }
 
-/** Of pixels, whose times are told too: then they take the places of lines and samples. */
+/** Of pixels, whose times take the places of lines and samples, and are told too. */
 void pixels_to_ground(const Scene& scene, GeneralSAROrbit& own, Points& points) {
-    std::vector<std::int32_t> outside(points.count());
-    const PixelTimes times{points.out[9].data(), points.out[10].data(), outside.data()};
-    require_solved(scene.grid().pixelTimes({points.count(), points.in[0].data(), points.in[1].data()}, times));
-    std::ranges::copy(points.out[9], points.in[0].begin());
-    std::ranges::copy(points.out[10], points.in[1].begin());
+    double *const first = points.in[0].data(), *const second = points.in[1].data();
+    require_solved(scene.grid().pixelTimes({points.count(), first, second}, {first, second}));
+    points.out[9] = points.in[0];
+    points.out[10] = points.in[1];
     to_ground(scene, own, points);
-    for (std::size_t i = 0; i < points.count(); ++i)
-        if (outside[i] != QUO_OK) points.status[i] = outside[i];
 }
 
 GeodeticPoint place_of(const Points& points, std::size_t i) {
@@ -180,8 +176,7 @@ void to_pixels_precisely(const Scene& scene, GeneralSAROrbit& own, Points& point
     find_pixels(scene, points);
 }
 
-constexpr const char* kAzimuthTime = "azimuth_time_s";
-constexpr Input kSample[] = {{.name = kAzimuthTime, .time = true}, {"range_time_s"}};
+constexpr Input kSample[] = {{kAzimuthTime}, {"range_time_s"}};
 constexpr Input kPixel[] = {{"line"}, {"sample"}};
 constexpr Input kPoint[] = {{"latitude_deg", -90.0, 90.0}, {"longitude_deg", -360.0, 360.0}, kHeight};
 constexpr const char* kGeometry[] = {"x_m",           "y_m",           "z_m",         "latitude_deg",
@@ -209,10 +204,34 @@ void check_use(const GeolocateOptions& options) {
 
 /** A table to the ground has times, or where it has none lines and samples. */
 const Direction& direction_of(const GeolocateOptions& options, const Table& table) {
-    if (options.direction == "ground")
-        return !table.find(kAzimuthTime) && table.find("line") ? kPixelsToGround : kToGround;
+    if (options.direction == "ground") {
+        if (table.find(kAzimuthTime)) return kToGround;
+        if (table.find("line")) return kPixelsToGround;
+        throw Failure(table.place_of_names() +
+                      ": neither columns azimuth_time_s and range_time_s nor line and sample");
+    }
     if (options.pixels) return options.precise ? kToPixelsPrecisely : kToPixels;
     return options.precise ? kToRadarPrecisely : kToRadar;
+}
+
+/** Why a point may have no solution, and what to look at. */
+std::string advice(const Direction& direction, const Scene& scene, int status) {
+    switch (status) {
+        case QUO_NOT_SEEN:
+            return ": the state vectors reach from " + iso_or_number(scene.first_time()) + " to " +
+                   iso_or_number(scene.last_time()) +
+                   (direction.ground ? ""
+                    : direction.line_at < direction.outputs.size()
+                        ? ", and the Earth may hide the point, or no burst show it"
+                        : ", and the Earth may hide the point");
+        case QUO_NUMERIC:
+            return ": no ground is there at that Doppler; range_time_s is two-way, in seconds";
+        case QUO_REFUSED:
+            return direction.inputs.data() == kPixel ? ": the pixel is in no burst, or before the first range"
+                                                     : ": no such range or height can be";
+        default:
+            return "";
+    }
 }
 
 /** Where a direction finds its values in a row of the table. */
@@ -223,7 +242,8 @@ public:
         for (const Input& input : direction.inputs) indices_.push_back(table.need(input.name));
         if (direction.ground) height_ = table.find(kHeight.name);
         if (height_ && options.height_m)
-            throw Failure(table.input().name() + ": there is a column " + kHeight.name + ", and --height");
+            throw Failure(table.place_of_names() + ": there is a column " + kHeight.name +
+                          "; leave --height out, or rename the column");
         given_height_m_ = options.height_m.value_or(0.0);
     }
     bool has_doppler() const { return doppler_.has_value(); }
@@ -245,15 +265,10 @@ private:
     static std::optional<std::string> read_one(const Row& row, const Input& input, std::size_t index,
                                                double& value) {
         const std::string_view text = row.fields()[index];
-        auto number = finite_number(text);
-        if (!number && input.time) number = date_of(text);
-        if (number && *number >= input.lowest && *number <= input.highest) {
-            value = *number;
-            return std::nullopt;
-        }
-        const std::string what = std::string{input.name} + " is \"" + std::string{text} + "\"";
-        if (!number) return what + (input.time ? ", neither a number nor a date" : ", not a number");
-        return what + ", outside " + fixed(input.lowest, 0) + " to " + fixed(input.highest, 0);
+        if (auto defect = read_value(text, input.name, value)) return defect;
+        if (value >= input.lowest && value <= input.highest) return std::nullopt;
+        return std::string{input.name} + " is \"" + std::string{text} + "\", outside " + fixed(input.lowest, 0) +
+               " to " + fixed(input.highest, 0);
     }
 
     std::size_t in_all_;
@@ -347,7 +362,8 @@ private:
             auto& cause = defects_[i];
             const int status = cause ? QUO_REFUSED : points_.status[i];
             append_row(text, line, number, cause.has_value());
-            if (!cause && status != 0) cause = "status " + status_text(status);
+            if (!cause && status != 0)
+                cause = "status " + status_text(status) + advice(*direction_, *scene_, status);
             append_values(i, status);
             if (status == 0 && !first_only_ && !std::isnan(points_.second_line[i])) {
                 append_row(text, line, number, false);
@@ -363,11 +379,10 @@ private:
         for (std::size_t k = 0; k < direction_->outputs.size(); ++k) {
             text += ',';
             if (status != 0) continue;
-            const std::string date = k == iso_at_ ? iso_text(points_.out[k][i]) : "";  // none before 1985
-            if (date.empty())
-                append_exact(text, points_.out[k][i]);
+            if (k == iso_at_)
+                text += iso_or_number(points_.out[k][i]);
             else
-                text += date;
+                append_exact(text, points_.out[k][i]);
         }
         text.append(",").append(std::to_string(status)).append("\n");
     }
@@ -428,7 +443,7 @@ int geolocate_table(Scene& scene, const GeolocateOptions& options) {
     output.commit();
     if (unsolved == 0) return kFine;
     complain(table.input().name() + ": " + std::to_string(unsolved) + " of " + std::to_string(rows) +
-             " rows without a solution");
+             " rows without a solution; column status tells which");
     return kFindings;
 }
 
@@ -463,7 +478,7 @@ constexpr const char* kDetails =
     "  radar:  reads latitude_deg, longitude_deg, height_m and, if there, doppler_hz; adds azimuth_time_s,\n"
     "          range_time_s, with --pixels line and sample, status\n"
     "Lines and samples count from 0 at the centre of the first; a point that two bursts see gets a row for each.\n"
-    "Azimuth times may be dates: \"04-JAN-2022 17:05:58.5\" or \"2022-01-04T17:05:58.5\".\n"
+    "Azimuth times may be dates: \"04-JAN-2022 17:05:58.5\" or \"2022-01-04T17:05:58.5Z\".\n"
     "Points of --to ground lie on the WGS84 ellipsoid, unless a column height_m or --height gives their heights.\n"
     "A computed column whose name is taken gets the prefix computed_.\n";
 

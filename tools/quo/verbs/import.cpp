@@ -1,7 +1,6 @@
 #include <memory>
 #include <optional>
 
-#include "apart.h"
 #include "commands.h"
 #include "interrupt.h"
 #include "progress.h"
@@ -15,14 +14,14 @@ struct ImportOptions {
     bool link = false, waitbar = false;
 };
 
-/** Told of the lines that are taken over; an exception does not go through the library. */
+/** Told of the bytes that are taken over; an exception does not go through the library. */
 struct Watch {
     explicit Watch(bool waitbar) : progress{waitbar ? "Importing" : nullptr} {}
 
     static int step(void* self, std::int64_t done, std::int64_t all) {
         auto& watch = *static_cast<Watch*>(self);
         try {
-            watch.progress.show(done, all, done);
+            watch.progress.step(done, all);
             throw_if_interrupted();
         } catch (const Interrupted& signal) {
             watch.interrupted = signal;
@@ -51,7 +50,6 @@ void show(const ImportOptions& options, const quo_import_result& result) {
 
 int import_product(const ImportOptions& options) {
     if (options.raster == "-") throw WrongUse("a raster cannot go to standard output");
-    require_apart({options.source, options.orbit}, raster_files(options.raster));
     note_interrupts();
     quo_import_request request{};
     request.source = options.source.c_str();

@@ -87,10 +87,10 @@ void add_sampling(Facts& facts, GeneralSAR& product) {
     }
 }
 
-void add_corners(Facts& facts, GeneralSAR& product) {
+void add_corners(Facts& facts, const std::string& header, GeneralSAR& product) {
     nlohmann::ordered_json list = nlohmann::json::array();
     std::string text;
-    for (const Corner& corner : corners_of(product)) {
+    for (const Corner& corner : corners_of(header, product)) {
         list.push_back({{"latitude_deg", corner.latitude_deg}, {"longitude_deg", corner.longitude_deg}});
         text += (text.empty() ? "" : "; ") + fixed(corner.latitude_deg, 5) + " " + fixed(corner.longitude_deg, 5);
     }
@@ -157,11 +157,17 @@ int show_info(const InfoOptions& options) {
     if (product.GSexists(gsOrbit)) add_orbit(facts, product.orbit);
     if (const RasterDescription* raster = described_raster(product)) add_raster(facts, *raster);
     if (product.GSexists(gsSamplingConstants)) add_sampling(facts, product);
-    add_geometry(facts, options.header, product);
-    add_corners(facts, product);
+    int status = kFine;
+    try {
+        add_geometry(facts, options.header, product);
+    } catch (const Failure& damaged) {  // a grid that makes none takes nothing from what else is known
+        complain(damaged.what());
+        status = kFindings;
+    }
+    add_corners(facts, options.header, product);
     add_objects(facts, product);
     options.json ? print_json(facts.json()) : print(facts.text(20));
-    return kFine;
+    return status;
 }
 
 }  // namespace

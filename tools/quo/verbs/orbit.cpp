@@ -18,15 +18,18 @@ struct OrbitOptions {
     std::string header;
     std::vector<std::string> at;
     std::optional<double> every_s;
-    bool json = false;
+    bool json = false, iso = false;
+
+    DateForm form() const { return iso ? DateForm::kIso : DateForm::kHeader; }
 };
+
+std::string date(double time_s, DateForm form) { return date_text(time_s, form).value_or("-"); }
 
 /** The platform at one time. */
 struct StateVector {
     double time_s, position_m[3], velocity_m_s[3];
 
     const char* direction() const { return velocity_m_s[2] > 0.0 ? "ascending" : "descending"; }
-    std::string date() const { return date_text(time_s).value_or("-"); }
 };
 
 /** The times from the first state vector to the last, `step_s` apart. */
@@ -56,8 +59,9 @@ std::vector<double> times_asked_for(const OrbitOptions& options, const Scene& sc
             continue;
         }
         ++outside;
-        complain(scene.name() + ": " + text + " lies outside the state vectors, " + exact(scene.first_time()) +
-                 " to " + exact(scene.last_time()));
+        const auto shown = [&](double t_s) { return options.iso ? iso_or_number(t_s) : exact(t_s); };
+        complain(scene.name() + ": " + text + " lies outside the state vectors, " + shown(scene.first_time()) +
+                 " to " + shown(scene.last_time()));
     }
     if (options.every_s) append_steps(times, scene, *options.every_s);
     return times;
@@ -76,14 +80,14 @@ std::vector<StateVector> state_vectors(Scene& scene, const std::vector<double>& 
     return list;
 }
 
-Facts facts_of(Scene& scene, const std::vector<std::string>& findings) {
+Facts facts_of(Scene& scene, const std::vector<std::string>& findings, DateForm form) {
     const GeneralSAROrbit& orbit = scene.orbit();
     const auto wavelength_m = scene.wavelength_m();
     const char* side = !scene.look_sign() ? nullptr : *scene.look_sign() < 0 ? "left" : "right";
     Facts facts;
     const auto add_time = [&](const char* name, double time_s) {
-        const std::string date = date_text(time_s).value_or("-");
-        facts.add(name, name, exact(time_s) + " s  " + date, {{"seconds", time_s}, {"date", date}});
+        const std::string text = date(time_s, form);
+        facts.add(name, name, exact(time_s) + " s  " + text, {{"seconds", time_s}, {"date", text}});
     };
     facts.add_text("header", "header", scene.name());
     facts.add("state vectors", "state_vectors",
@@ -103,9 +107,9 @@ Facts facts_of(Scene& scene, const std::vector<std::string>& findings) {
     return facts;
 }
 
-Json as_json(const StateVector& vector) {
+Json as_json(const StateVector& vector, DateForm form) {
     return {{"seconds", vector.time_s},
-            {"date", vector.date()},
+            {"date", date(vector.time_s, form)},
             {"direction", vector.direction()},
             {"position_m", vector.position_m},
             {"velocity_m_s", vector.velocity_m_s}};
@@ -119,8 +123,8 @@ std::string as_comments(const std::string& text) {
     return comments + "\n";
 }
 
-std::string as_row(const StateVector& vector) {
-    std::string row = exact(vector.time_s) + "," + vector.date() + "," + vector.direction();
+std::string as_row(const StateVector& vector, DateForm form) {
+    std::string row = exact(vector.time_s) + "," + date(vector.time_s, form) + "," + vector.direction();
     for (const double value : vector.position_m) row += "," + exact(value);
     for (const double value : vector.velocity_m_s) row += "," + exact(value);
     return row + "\n";
@@ -132,10 +136,10 @@ int show_orbit(const OrbitOptions& options) {
     const auto vectors = state_vectors(scene, times_asked_for(options, scene, outside));
     const auto findings = scene.findings();
 
-    const Facts facts = facts_of(scene, findings);
+    const Facts facts = facts_of(scene, findings, options.form());
     if (options.json) {
         Json json = facts.json();
-        for (const StateVector& vector : vectors) json["at"].push_back(as_json(vector));
+        for (const StateVector& vector : vectors) json["at"].push_back(as_json(vector, options.form()));
         print_json(json);
     } else if (vectors.empty()) {
         print(facts.text(kWidth));
@@ -143,7 +147,7 @@ int show_orbit(const OrbitOptions& options) {
         Output output{"-"};
         output.write(shown_lines(as_comments(facts.text(kWidth))));
         output.write("azimuth_time_s,date,direction,x_m,y_m,z_m,vx_m_s,vy_m_s,vz_m_s\n");
-        for (const StateVector& vector : vectors) output.write(as_row(vector));
+        for (const StateVector& vector : vectors) output.write(as_row(vector, options.form()));
         output.commit();
     }
     return outside == 0 && findings.empty() ? kFine : kFindings;
@@ -156,9 +160,10 @@ void add_orbit(Command& program) {
         program, "orbit",
         "Shows a header's orbit, what is wrong with it, and position and velocity at chosen times", show_orbit);
     command.needs("HEADER", options.header, "Product header with the orbit");
-    command.takes("--at", options.at, "Time: seconds since 1985, or a date text");
+    command.takes("--at", options.at, "Time: seconds since 1985, or a date");
     command.takes("--every", options.every_s, "From the first state vector to the last, in steps of seconds",
                   {.excludes = "--at"});
+    command.flag("--iso", options.iso, "Write dates as ISO 8601");
     command.flag("--json", options.json, "Print JSON");
 }
 

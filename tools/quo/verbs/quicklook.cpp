@@ -208,9 +208,14 @@ int quicklook(const QuicklookOptions& options) {
     const Stretch stretch = stretch_of(options, multilook.power(), multilook.view().width());
     drawing::Picture picture = picture_of(multilook.power(), stretch, view);
     if (options.frame) picture = with_frame(picture, options, described, view, multilook.looks(), stretch);
-    write_output(options.picture, png_of(picture));
-    if (map) {
-        write_output(world_name(options.picture), world_text(*map));
+    Output output{options.picture};
+    output.write(png_of(picture));
+    if (!map) {
+        output.commit();
+    } else {
+        Output world{world_name(options.picture)};
+        world.write(world_text(*map));
+        commit_together(output, world);
         said += world_name(options.picture) + ": longitude and latitude in degrees, off by " + rough(map->rms_m) +
                 " m rms, " + rough(map->most_m) + " m at most\n";
     }

@@ -128,7 +128,7 @@ class PartResampler {
 public:
     PartResampler(const std::string& name, const RasterDescription& in, const Size& from, const Size& to,
                   double centre)
-        : in_{name, in}, from_{from}, to_{to}, resampler_{from, to, centre}, source_(from.count()) {}
+        : in_{name, in}, to_{to}, resampler_{from, to, centre}, source_(from.count()) {}
 
     Resampled run(const Part& part) {
         Resampled result{part.to, std::vector<fcomplex>(to_.count())};
@@ -148,7 +148,7 @@ private:
     }
 
     RasterReader in_;
-    Size from_, to_;
+    Size to_;
     Resampler resampler_;
     std::vector<fcomplex> source_;
 };

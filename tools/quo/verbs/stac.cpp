@@ -1,4 +1,3 @@
-#include <charconv>
 #include <cmath>
 #include <filesystem>
 #include <nlohmann/json.hpp>
@@ -9,6 +8,7 @@
 #include "outline.h"
 #include "pixels.h"
 #include "product.h"
+#include "sarutillib/ground/letters.h"
 
 namespace tool {
 namespace {
@@ -20,12 +20,6 @@ constexpr const char* kExtensions[] = {"https://stac-extensions.github.io/sar/v1
                                        "https://stac-extensions.github.io/sat/v1.0.0/schema.json",
                                        "https://stac-extensions.github.io/projection/v1.1.0/schema.json",
                                        "https://stac-extensions.github.io/view/v1.0.0/schema.json"};
-
-std::string lower(std::string text) {
-    for (char& c : text)
-        if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
-    return text;
-}
 
 /** The letter of a radar band; empty for a frequency in none. */
 std::string band_of(double frequency_ghz) {
@@ -40,32 +34,32 @@ std::string band_of(double frequency_ghz) {
 }
 
 /** "IW" of the swath "IW1", where swaths are named after their mode, else the mode as the header has it. */
-std::string mode_of(const DataSetInfo_Obj& info) {
-    const std::string_view swath = info.Swath, letters = swath.substr(0, swath.find_first_of("0123456789"));
+std::string mode_of(const Told& told) {
+    const std::string_view swath = told.swath, letters = swath.substr(0, swath.find_first_of("0123456789"));
     if (letters.size() == 2) return std::string{letters};
-    return is_told(info.AcquisitionMode) ? info.AcquisitionMode : "";
+    return told.mode;
 }
 
 /** The usual name of what the image is, where it has one. */
-std::string type_of(const DataSetInfo_Obj& info) {
+std::string type_of(const DataSetInfo_Obj& info, const Told& told) {
     if (info.IsImageType(DataSetInfo_Obj::dsAzimuthFocused) && info.IsProjection(DataSetInfo_Obj::dsSlantRange))
         return "SLC";
     if (info.IsImageType(DataSetInfo_Obj::dsMultilook) && info.IsProjection(DataSetInfo_Obj::dsGroundRange))
         return "GRD";
-    return is_told(info.ImageType) ? info.ImageType : "";
+    return told.image_type;
 }
 
 /** A product as an item of a catalogue. */
 class Item {
 public:
     Item(const std::string& header, GeneralSAR& product)
-        : header_{header}, product_{product}, pixels_{header, product} {}
+        : header_{header}, product_{product}, told_{product}, pixels_{header, product} {}
 
     Json make() {
         const Outline outline = outline_of(header_, product_);
         const DataSetInfo_Obj& info = product_.dataSetInfo;
         add_times();
-        if (is_told(info.SensorName)) properties_["platform"] = lower(info.SensorName);
+        if (!told_.mission.empty()) properties_["platform"] = quo::lower(told_.mission);
         add_radar(info);
         add_orbit(info);
         add_pixels();
@@ -73,7 +67,7 @@ public:
         return {{"type", "Feature"},
                 {"stac_version", "1.0.0"},
                 {"stac_extensions", kExtensions},
-                {"id", is_told(info.SceneID) ? std::string{info.SceneID} : raster_of(file).value_or(file)},
+                {"id", told_.scene.empty() ? raster_of(file).value_or(file) : told_.scene},
                 {"geometry", outline.geometry},
                 {"bbox", outline.box},
                 {"properties", properties_},
@@ -100,30 +94,28 @@ private:
 
     void add_radar(const DataSetInfo_Obj& info) {
         const double frequency_ghz = product_.samplingConstants.fc_hz * 1e-9;
-        std::string polarization = info.Polarization;
+        std::string polarization = told_.polarization;
         std::erase(polarization, '/');
         const bool known = std::set<std::string>{"HH", "VV", "HV", "VH"}.contains(polarization);
         properties_["sar:instrument_mode"] =
-            required(mode_of(info), "acquisition mode (DataSetInfo/AcquisitionMode)");
+            required(mode_of(told_), "acquisition mode (DataSetInfo/AcquisitionMode)");
         properties_["sar:frequency_band"] =
             required(band_of(frequency_ghz), "frequency of a radar band (SamplingConstants/fc_hz)");
         properties_["sar:center_frequency"] = frequency_ghz;
         properties_["sar:polarizations"] =
             Json::array({required(known ? polarization : "", "polarization (DataSetInfo/Polarization)")});
-        properties_["sar:product_type"] = required(type_of(info), "image type (DataSetInfo/ImageType)");
+        properties_["sar:product_type"] = required(type_of(info, told_), "image type (DataSetInfo/ImageType)");
         properties_["sar:observation_direction"] = info.LookDirection < 0 ? "left" : "right";
         if (info.RangeLooks > 0) properties_["sar:looks_range"] = info.RangeLooks;
     }
 
     void add_orbit(const DataSetInfo_Obj& info) {
-        properties_["sat:orbit_state"] = product_.orbit.isAscending() ? "ascending" : "descending";
+        properties_["sat:orbit_state"] = told_.direction;
         add_number("sat:absolute_orbit", info.OrbitNumber);
         add_number("sat:relative_orbit", info.Track);
     }
     void add_number(const char* key, const std::string& text) {
-        int number = 0;
-        const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
-        if (error == std::errc{} && end == text.data() + text.size() && number > 0) properties_[key] = number;
+        if (const auto number = whole_number(text); number && *number > 0) properties_[key] = *number;
     }
 
     void add_pixels() {
@@ -163,6 +155,7 @@ private:
 
     const std::string& header_;
     GeneralSAR& product_;
+    const Told told_;
     Pixels pixels_;
     Json properties_ = Json::object();
 };

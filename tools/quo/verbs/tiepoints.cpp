@@ -6,7 +6,7 @@
 #include <span>
 
 #include "commands.h"
-#include "residuals.h"
+#include "sarutillib/ground/residuals.h"
 #include "scene.h"
 #include "table.h"
 
@@ -45,7 +45,7 @@ struct Agreement {
     std::string scene;
     Vertical vertical = Vertical::kEllipsoidNormal;
     std::int64_t points = 0, unsolved = 0;
-    std::array<Residuals, kQuantities> residuals;  // in the order of kQuantity
+    std::array<quo::Residuals, kQuantities> residuals;  // in the order of kQuantity
 
     std::int64_t solved() const { return points - unsolved; }
 };
@@ -147,9 +147,9 @@ Agreement check_scene(const std::string& header, const TiepointsOptions& options
     scene.require_look_side();
     scene.require_wavelength();
     Table table{options.points.empty() ? points_beside(header) : options.points};
-    const std::size_t columns[] = {table.need("azimuth_time_s"), table.need("range_time_s"),
-                                   table.need("latitude_deg"),   table.need("longitude_deg"),
-                                   table.need("height_m"),       table.need("incidence_deg")};
+    const std::size_t columns[] = {table.need(kAzimuthTime),   table.need("range_time_s"),
+                                   table.need("latitude_deg"), table.need("longitude_deg"),
+                                   table.need("height_m"),     table.need("incidence_deg")};
     Agreement agreement{
         .scene = scene_name(header), .vertical = vertical_of(table, options.incidence), .residuals = {}};
     std::vector<TiePoint> ties;
@@ -171,7 +171,7 @@ std::string as_row(const Agreement& agreement, std::size_t name_width) {
     const std::string name = shown(agreement.scene);
     std::string row = name + std::string(name_width - name.size(), ' ') +
                       padded(std::to_string(agreement.points), 8) + padded(std::to_string(agreement.solved()), 8);
-    for (const Residuals& residual : agreement.residuals)
+    for (const quo::Residuals& residual : agreement.residuals)
         for (const double value : {residual.largest(), residual.rms()})
             row += padded(agreement.solved() > 0 ? rough(value) : "-", kNumberWidth);
     return row + "\n";
@@ -227,7 +227,7 @@ constexpr const char* kDetails =
     "Tie points are ground points whose azimuth time and range time are known. Azimuth time and slant range are\n"
     "found from the ground point, ground position and incidence angle from the times and the point's height.\n"
     "Reads azimuth_time_s, range_time_s, latitude_deg, longitude_deg, height_m and incidence_deg from\n"
-    "SCENE_tie_points.csv beside SCENE.xml.\n";
+    "SCENE_tie_points.csv beside SCENE.xml. Azimuth times may be dates.\n";
 
 }  // namespace
 

@@ -8,7 +8,7 @@ namespace {
 
 struct TimeOptions {
     std::vector<std::string> times;
-    bool json = false;
+    bool json = false, iso = false;
 };
 
 int convert_times(const TimeOptions& options) {
@@ -17,7 +17,7 @@ int convert_times(const TimeOptions& options) {
     std::string text;
     for (const std::string& time : options.times) {
         const double seconds = seconds_of(time);
-        const auto date = date_text(seconds);
+        const auto date = date_text(seconds, options.iso ? DateForm::kIso : DateForm::kHeader);
         if (!date) {
             complain(time + ": date texts reach from 1985 to 9999");
             result = kFindings;
@@ -34,7 +34,9 @@ int convert_times(const TimeOptions& options) {
 void add_time(Command& program) {
     auto [command, options] =
         add_verb(program, "time", "Seconds since 1985 to date texts, and back", convert_times);
-    command.needs("TIME", options.times, "Seconds, or a date such as \"04-JAN-2022 17:05:58.5\"");
+    command.needs("TIME", options.times,
+                  "Seconds, or a date such as \"04-JAN-2022 17:05:58.5\" or \"2022-01-04T17:05:58.5Z\"");
+    command.flag("--iso", options.iso, "Write dates as ISO 8601");
     command.flag("--json", options.json, "Print JSON");
 }
 

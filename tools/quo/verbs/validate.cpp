@@ -331,7 +331,7 @@ private:
     // Corners are geolocated on the ellipsoid; the ground's height shifts them by a few kilometres at most.
     void check_corners() {
         constexpr double kFar_m = 2e4;
-        const std::vector<Corner> grid = grid_corners(product_), orbit = orbit_corners(product_);
+        const std::vector<Corner> grid = grid_corners(product_), orbit = orbit_corners(header_, product_);
         if (grid.empty() || orbit.empty()) return;
         for (const Corner& corner : grid) {
             const quo::Vec3 place = quo::from_geodetic({corner.latitude_deg, corner.longitude_deg, 0.0});

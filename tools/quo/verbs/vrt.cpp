@@ -7,11 +7,11 @@
 
 #include "apart.h"
 #include "commands.h"
-#include "date.h"
 #include "output.h"
 #include "pixels.h"
 #include "product.h"
 #include "raster.h"
+#include "sarutillib/ground/letters.h"
 #include "sarutillib/ground/quoted_xml.h"
 
 namespace tool {
@@ -152,44 +152,41 @@ std::string control_points(const Pixels& pixels, int lines = 2, int columns = 5)
     return text + "  </GCPList>\n";
 }
 
-std::string metadata(GeneralSAR& product) {
-    const DataSetInfo_Obj& info = product.dataSetInfo;
+std::string metadata(const Told& told) {
     std::string text;
-    const auto add = [&](const char* key, const std::string& value) {
-        if (is_told(value))
+    for (const auto& [key, value] : {std::pair{"MISSION_ID", told.mission},
+                                     {"MODE", told.mode},
+                                     {"SWATH", told.swath},
+                                     {"POLARISATION", told.polarization},
+                                     {"ORBIT_NUMBER", told.orbit_number},
+                                     {"PRODUCT_TYPE", told.image_type},
+                                     {"PRODUCT_NAME", told.scene},
+                                     {"ORBIT_DIRECTION", quo::upper(told.direction)},
+                                     {"ACQUISITION_START_TIME", told.start_time},
+                                     {"ACQUISITION_STOP_TIME", told.stop_time}})
+        if (!value.empty())
             text += "    <MDI key=\"" + std::string{key} + "\">" + quo::quoted_xml(value) + "</MDI>\n";
-    };
-    if (product.GSexists(gsDataSetInfo)) {
-        add("MISSION_ID", info.SensorName);
-        add("MODE", info.AcquisitionMode);
-        add("SWATH", info.Swath);
-        add("POLARISATION", info.Polarization);
-        add("ORBIT_NUMBER", info.OrbitNumber);
-        add("PRODUCT_TYPE", info.ImageType);
-        add("PRODUCT_NAME", info.SceneID);
-    }
-    if (product.GSexists(gsOrbit))
-        add("ORBIT_DIRECTION", product.orbit.isAscending() ? "ASCENDING" : "DESCENDING");
-    if (product.GSexists(gsRoi) && product.roi.Roi.isNULL() == 0) {
-        add("ACQUISITION_START_TIME", iso_text(product.roi.Roi.SlowStartTime));
-        add("ACQUISITION_STOP_TIME", iso_text(last_line_time(product.roi.Roi)));
-    }
     return text.empty() ? text : "  <Metadata>\n" + text + "  </Metadata>\n";
 }
 
 /** What the header beside a raster tells of it beyond its layout; empty where that is all. */
 struct Described {
     std::string before_band, band_name;
+    std::string damage;  // what keeps the raster from having control points, though the header should place it
 };
 Described describe(const std::string& header) {
     GeneralSAR product;
     if (product.GSread(header.c_str()) != QUO_OK) return {};
-    Described described{metadata(product), ""};
-    if (Pixels::known(header, product))
-        described.before_band = control_points({header, product}) + described.before_band;
-    const std::string polarization = product.dataSetInfo.Polarization;
-    if (product.GSexists(gsDataSetInfo) && is_told(polarization))
-        described.band_name = element("Description", quo::quoted_xml(polarization));
+    const Told told{product};
+    Described described{metadata(told), "", ""};
+    try {
+        if (Pixels::known(header, product))
+            described.before_band = control_points({header, product}) + described.before_band;
+    } catch (const Failure& damaged) {
+        described.damage = damaged.what();
+    }
+    if (!told.polarization.empty())
+        described.band_name = element("Description", quo::quoted_xml(told.polarization));
     return described;
 }
 
@@ -217,9 +214,11 @@ int write_vrt(const std::string& name) {
     read_description(name, raster);
     if (raster.CellType == INT8_COMPLEX) throw Failure(name + ": GDAL has no type for INT8_COMPLEX");
     require_apart(raster_files(name), {name + ".vrt"});
-    write_output(name + ".vrt",
-                 vrt_text(raster, std::filesystem::path{name}.filename().string(), describe(name + ".hdr")));
-    return kFine;
+    const Described described = describe(name + ".hdr");
+    write_output(name + ".vrt", vrt_text(raster, std::filesystem::path{name}.filename().string(), described));
+    if (described.damage.empty()) return kFine;
+    complain(described.damage + "; the image has no control points");
+    return kFindings;
 }
 
 }  // namespace

@@ -7,6 +7,7 @@
 #include "generalSAR/container/readable_file.h"
 #include "generalSAR/objects/raster_name.h"
 #include "profilelib/profile_look.h"
+#include "quorelxmllib/element_path.h"
 #include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_session.h"
 #include "sarutillib/ground/bounded_text.h"
@@ -21,12 +22,6 @@ bool is_object(int object) { return object >= 0 && object < GeneralSAR::kObjects
 std::string side_file_of(const char* header) {
     const auto raster = quo::raster_of_header(quo::text_or_empty(header));
     return raster ? *raster + ".hdr" : "";
-}
-
-bool stands_at(std::string_view field, const parElement& element) {
-    const std::string_view section = element.section, name = element.name;
-    return field.size() == section.size() + 1 + name.size() && field.starts_with(section) &&
-           field[section.size()] == '/' && field.ends_with(name);
 }
 
 template <auto Object>
@@ -115,11 +110,7 @@ const GeneralSAR_Base* GeneralSAR::GSelements(GSObject object) const noexcept {
 
 const parElement* GeneralSAR::GSelement(GSObject object, std::string_view field) const noexcept {
     const GeneralSAR_Base* const elements = GSelements(object);
-    for (int i = 0; elements && i < elements->elementCount(); ++i) {
-        const parElement* const element = elements->element(i);
-        if (stands_at(field, *element)) return element;
-    }
-    return nullptr;
+    return elements ? quo::element_at(*elements, field) : nullptr;
 }
 
 int GeneralSAR::GSenable(GSObject object) noexcept {

@@ -6,6 +6,7 @@
 #include <string>
 
 #include "diagnosticslib/call_frame.h"
+#include "generalSAR/derived_raster/corner_points.h"
 #include "quo_base/generalSAR.h"
 #include "quo_base/image_grid.h"
 #include "quorelxmllib/guarded.h"
@@ -73,9 +74,10 @@ private:
         if (rates_ && product_.GSexists(gsPulse))
             if (const int status = product_.pulse.writehdr(header)) return status;
         // The data set tells the look side.
-        const bool corners = moved_ && product_.GSexists(gsGeoCoords) && product_.GSexists(gsOrbit) &&
-                             product_.GSexists(gsDataSetInfo) &&
-                             product_.orbit.SVGetGeoCoords(&product_.geoCoords, &product_.roi) == QUO_OK;
+        const bool corners =
+            moved_ && product_.GSexists(gsGeoCoords) && product_.GSexists(gsOrbit) &&
+            product_.GSexists(gsDataSetInfo) &&
+            quo::place_corners(grid_, raster_.NrOfLinesPerImage, raster_.NrOfPixelsPerLine, product_) == QUO_OK;
         return corners ? product_.geoCoords.writehdr(header) : QUO_OK;
     }
 

@@ -123,7 +123,8 @@ public:
             const double line = (line_time_s - grid_.BurstStart_s[burst]) / grid_.LineStep_s;
             if (line < -0.5 || line >= grid_.LinesPerBurst - 0.5) continue;
             const double k = line + static_cast<double>(burst) * grid_.LinesPerBurst - grid_.FirstLine;
-            if (std::isnan(lines.first))
+            // A cut begins behind the lines of bursts before it.
+            if (std::isnan(lines.first) || lines.first < -0.5)
                 lines.first = k;
             else if (std::isnan(lines.second))
                 lines.second = k;

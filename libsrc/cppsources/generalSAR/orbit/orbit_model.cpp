@@ -61,6 +61,7 @@ int OrbitModel::build(const StateVectors& states, double t0) noexcept {
     resampling_m_ = 0.0;
     times_ = {t0, states.spacing_s, static_cast<double>(runs_count_ - 1)};
     if (const int status = fit_runs(states)) return status;
+    bound_motion();
     cursor_.in_use = use_run(times_, 0.0);
     if (const int status = fit_whole(states)) return status;
     plant_places();
@@ -79,6 +80,28 @@ int OrbitModel::fit_runs(const StateVectors& states) noexcept {
         run.chord = straight_flight(states.position(k), states.position(k + kRunVectors - 1), times_.run_length());
     }
     return QUO_OK;
+}
+
+void OrbitModel::bound_motion() noexcept {
+    const double middle_s = 0.5 * times_.run_length(), half_s = middle_s + kEndTolerance_s;
+    const auto raise = [](double& most, double value) {
+        if (!(value <= most)) most = std::isnan(value) ? HUGE_VAL : value;
+    };
+    OrbitState before{};
+    bounds_ = {};
+    for (std::int32_t k = 0; k < runs_count_; ++k) {
+        const OrbitRun& here = run(k);
+        const OrbitState at = orbit_state(here.curve(), middle_s), early = orbit_state(here.curve(), spacing());
+        // By Taylor's formula about the middle, which ends with the fourth derivative.
+        const Vec3 fourth = 24.0 * Vec3{here.x[0], here.y[0], here.z[0]};
+        const Vec3 third = 6.0 * Vec3{here.x[1], here.y[1], here.z[1]} + middle_s * fourth;
+        const double most = norm(at.acceleration) + half_s * (norm(third) + 0.5 * half_s * norm(fourth));
+        raise(bounds_.acceleration_m_s2, most);
+        raise(bounds_.speed_m_s, norm(at.velocity) + half_s * most);
+        if (k > 0) raise(bounds_.shift_m, norm(early.position - before.position));
+        if (k > 0) raise(bounds_.kick_m_s, norm(early.velocity - before.velocity));
+        before = at;
+    }
 }
 
 int OrbitModel::fit_whole(const StateVectors& states) noexcept {
@@ -293,22 +316,51 @@ void OrbitModel::search_piece(double from_s, double to_s, std::int32_t run_numbe
     }
 }
 
-int OrbitModel::search_all(const Target& target, PointTimes* found) const noexcept {
-    // Neighbouring runs differ a little, and each serves for times that others serve for as well. Where two
-    // solutions nearly meet only one of the runs may have them, so that each is searched over all it serves for.
-    const std::int32_t last = runs_count_ - 1;
+// Neighbouring runs differ a little, and each serves for times that others serve for as well. Where two solutions
+// nearly meet only one of the runs may have them, so that each is searched over all it serves for.
+void OrbitModel::search_run(std::int32_t run_number, const Target& target, Nearest& nearest) const noexcept {
+    const std::int32_t k = run_number;
     const double dt = spacing();
-    Nearest nearest{found};
-    for (std::int32_t k = 0; k <= last; ++k) {
-        const double from = k == 0 ? -kEndTolerance_s : (k + kKeepFrom) * dt;
-        const double to = k == last ? length() + kEndTolerance_s : (k + kKeepUntil) * dt;
-        double at = from;
-        for (std::int32_t vector = k + 1; vector <= k + 3; ++vector) {
-            search_piece(at, vector * dt, k, target, nearest);
-            at = vector * dt;
-        }
-        search_piece(at, to, k, target, nearest);
+    const double to = k == runs_count_ - 1 ? length() + kEndTolerance_s : (k + kKeepUntil) * dt;
+    double at = k == 0 ? -kEndTolerance_s : (k + kKeepFrom) * dt;
+    for (std::int32_t vector = k + 1; vector <= k + 3; ++vector) {
+        search_piece(at, vector * dt, k, target, nearest);
+        at = vector * dt;
     }
+    search_piece(at, to, k, target, nearest);
+}
+
+/** False where all runs from one to another keep the sign of the residual, or stay further away than the nearest
+ * time found: told from the middle of the run among them by how far the platform gets and turns from there, going
+ * over from each run to the next in its middle. */
+bool OrbitModel::may_improve(std::int32_t first, std::int32_t last, const Target& target,
+                             const Nearest& nearest) const noexcept {
+    constexpr double kRounding = 1e-6;  // of a residual as a range rate, m/s; and of a range
+    const std::int32_t middle = first + (last - first) / 2;
+    const double runs = last - middle, flight_s = (runs + 2.0) * spacing() + kEndTolerance_s;
+    const Crossing at = crossing_at((middle + 2) * spacing(), middle, target);
+    const double range_m = 0.5 * kLightSpeed * at.range_s;
+    const double moved_m = bounds_.speed_m_s * flight_s + runs * bounds_.shift_m;
+    const double turned_m_s = bounds_.acceleration_m_s2 * flight_s + runs * bounds_.kick_m_s;
+    const double change = (bounds_.speed_m_s + std::abs(target.range_rate_m_s()) + kRounding) * moved_m +
+                          (turned_m_s + kRounding) * range_m;
+    const bool further = nearest.status == QUO_OK &&
+                         range_m - moved_m > (1.0 + kRounding) * 0.5 * kLightSpeed * nearest.found->range_s;
+    return !(std::abs(at.residual) > change || further);
+}
+
+void OrbitModel::search_runs(std::int32_t first, std::int32_t last, const Target& target,
+                             Nearest& nearest) const noexcept {
+    if (!may_improve(first, last, target, nearest)) return;
+    if (first == last) return search_run(first, target, nearest);
+    const std::int32_t middle = first + (last - first) / 2;
+    search_runs(first, middle, target, nearest);
+    search_runs(middle + 1, last, target, nearest);
+}
+
+int OrbitModel::search_all(const Target& target, PointTimes* found) const noexcept {
+    Nearest nearest{found};
+    search_runs(0, runs_count_ - 1, target, nearest);
     return nearest.status;
 }
 

@@ -30,6 +30,12 @@ struct RunCursor {
     std::int64_t switches;
 };
 
+/** What the motion on no run exceeds: its speed and acceleration, and by how much place and velocity change where
+ * one run takes over from the one before, in the middle of that one. */
+struct MotionBounds {
+    double speed_m_s, acceleration_m_s2, shift_m, kick_m_s;
+};
+
 /** What an orbit model holds beside its runs. */
 struct OrbitModelValues {
     RunTimes times_{};
@@ -37,6 +43,7 @@ struct OrbitModelValues {
     RunInUse fresh_{};
     StraightFlight mean_{};                                 // from the first vector to the last
     double coarse_x_[5]{}, coarse_y_[5]{}, coarse_z_[5]{};  // the whole orbit, in the time since the first vector
+    MotionBounds bounds_{};
     double resampling_m_ = 0.0;  // what the interpolation that made the vectors may have left
     double arc_rad_ = 0.0;
     std::int32_t places_count_ = 0;  // the first ones of places_, a tree of run starts
@@ -161,7 +168,12 @@ private:
     struct Nearest;
     void search_piece(double from_s, double to_s, std::int32_t run_number, const Target& target,
                       Nearest& nearest) const noexcept;
+    void search_run(std::int32_t run_number, const Target& target, Nearest& nearest) const noexcept;
+    void search_runs(std::int32_t first, std::int32_t last, const Target& target, Nearest& nearest) const noexcept;
+    [[nodiscard]] bool may_improve(std::int32_t first, std::int32_t last, const Target& target,
+                                   const Nearest& nearest) const noexcept;
     int fit_runs(const StateVectors& states) noexcept;
+    void bound_motion() noexcept;
     int fit_whole(const StateVectors& states) noexcept;
     void plant_places() noexcept;
 

@@ -16,6 +16,7 @@
 #include "quo_base/derived_raster.h"
 #include "quo_base/generalSAR.h"
 #include "quo_base/image_grid.h"
+#include "quorelxmllib/element_path.h"
 #include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_session.h"
 #include "sarutillib/ground/array_extents.h"
@@ -90,12 +91,15 @@ const parElement* polynomial_element(const polySAR& polynomials, std::string_vie
     return nullptr;
 }
 
-const parElement* element_at(const GeneralSAR& header, std::string_view field) {
+const parElement* element_at(const OpenProduct& product, std::string_view field) {
+    const GeneralSAR& header = product.header;
     for (int i = gsRoi; i < GeneralSAR::kObjects; ++i) {
         const auto object = static_cast<GSObject>(i);
         if (!header.GSexists(object)) continue;
         if (const parElement* const element = header.GSelement(object, field)) return element;
     }
+    if (product.grid_status == QUO_OK)
+        if (const parElement* const element = quo::element_at(product.grid, field)) return element;
     return header.GSexists(gsPolySAR) ? polynomial_element(header.polynomials, field) : nullptr;
 }
 
@@ -111,7 +115,7 @@ template <typename Use>
 int with_field(const quo::SharedCall& function, const quo_product* handle, const char* field, Use use) noexcept {
     return with_product(function, handle, [&](quo::CallFrame& frame, const OpenProduct& product) {
         if (!field) return frame.fail(QUO_REFUSED, kNull);
-        const parElement* const element = element_at(product.header, field);
+        const parElement* const element = element_at(product, field);
         return element ? use(frame, *element) : refuse_field(frame, field);
     });
 }

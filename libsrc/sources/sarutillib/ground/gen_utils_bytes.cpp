@@ -7,6 +7,7 @@
 #include <cstring>
 
 #include "quo_base/gen_utils.h"
+#include "sarutillib/ground/processor_level.h"
 
 namespace {
 
@@ -54,21 +55,19 @@ template <typename Bits>
     }
 }
 
-// The byte shuffles that make these loops fast came after the processors' common base: each loop is compiled for
-// several of them, and the form to use is chosen when the library is loaded: too early for the thread sanitizer.
-#if defined(__x86_64__) && defined(__gnu_linux__) && !defined(__SANITIZE_THREAD__)
-#define QUO_FORM_PER_PROCESSOR __attribute__((target_clones("avx2", "ssse3", "default")))
-#else
-#define QUO_FORM_PER_PROCESSOR
+#if defined(__x86_64__)
+// The byte shuffles that make these loops fast came after the processors' common base.
+template <typename Bits>
+[[gnu::target("avx2")]] void swap_each_avx2(void* buffer, std::int64_t count) noexcept {
+    swap_each<Bits>(buffer, count);
+}
 #endif
-QUO_FORM_PER_PROCESSOR void swap_2(void* buffer, std::int64_t count) noexcept {
-    swap_each<std::uint16_t>(buffer, count);
-}
-QUO_FORM_PER_PROCESSOR void swap_4(void* buffer, std::int64_t count) noexcept {
-    swap_each<std::uint32_t>(buffer, count);
-}
-QUO_FORM_PER_PROCESSOR void swap_8(void* buffer, std::int64_t count) noexcept {
-    swap_each<std::uint64_t>(buffer, count);
+template <typename Bits>
+void swap_all(void* buffer, std::int64_t count) noexcept {
+#if defined(__x86_64__)
+    if (quo::processor_level() >= quo::ProcessorLevel::kAvx2) return swap_each_avx2<Bits>(buffer, count);
+#endif
+    swap_each<Bits>(buffer, count);
 }
 
 // High words of a double and words of a float.
@@ -115,9 +114,9 @@ void short2ch(std::int16_t value, void* bytes, char order) noexcept {
     write_bits(static_cast<std::uint16_t>(value), bytes, order);
 }
 
-void swp2(void* buffer, std::int64_t count) noexcept { swap_2(buffer, count); }
-void swp4(void* buffer, std::int64_t count) noexcept { swap_4(buffer, count); }
-void swp8(void* buffer, std::int64_t count) noexcept { swap_8(buffer, count); }
+void swp2(void* buffer, std::int64_t count) noexcept { swap_all<std::uint16_t>(buffer, count); }
+void swp4(void* buffer, std::int64_t count) noexcept { swap_all<std::uint32_t>(buffer, count); }
+void swp8(void* buffer, std::int64_t count) noexcept { swap_all<std::uint64_t>(buffer, count); }
 
 void swp_any(void* buffer, std::int64_t length_in_bytes, int element_size) noexcept {
     if (element_size <= 0 || element_size % 2 != 0) return;

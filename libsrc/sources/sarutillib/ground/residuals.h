@@ -1,11 +1,11 @@
-#ifndef QUO_TOOL_RESIDUALS_H
-#define QUO_TOOL_RESIDUALS_H
+#ifndef QUO_RESIDUALS_H
+#define QUO_RESIDUALS_H
 
 #include <algorithm>
 #include <cmath>
 #include <cstdint>
 
-namespace tool {
+namespace quo {
 
 /** Size of a quantity's residuals. */
 class Residuals {
@@ -15,15 +15,17 @@ public:
         squares_ += difference * difference;
         ++count_;
     }
-    double largest() const { return largest_; }
-    double rms() const { return count_ > 0 ? std::sqrt(squares_ / static_cast<double>(count_)) : 0.0; }
-    std::int64_t count() const { return count_; }
+    [[nodiscard]] double largest() const { return largest_; }
+    [[nodiscard]] double rms() const {
+        return count_ > 0 ? std::sqrt(squares_ / static_cast<double>(count_)) : 0.0;
+    }
+    [[nodiscard]] std::int64_t count() const { return count_; }
 
 private:
     double largest_ = 0.0, squares_ = 0.0;
     std::int64_t count_ = 0;
 };
 
-}  // namespace tool
+}  // namespace quo
 
 #endif

@@ -1,0 +1,25 @@
+"""Where the corners and the middle of an image lie on the ground, and how they are seen.
+
+Usage: geolocate.py HEADER [HEIGHT_M]
+"""
+
+import sys
+
+import numpy as np
+from quo_base import Product
+
+
+def main(header, height="0"):
+    product = Product(header)
+    region = product.ROI
+    lines, samples = region.Lines - 1, region.Samples - 1
+    line = np.array([0, 0, lines, lines, lines / 2])
+    sample = np.array([0, samples, samples, 0, samples / 2])
+    times = product.grid.times(line, sample)
+    seen = product.orbit.geometry(times.azimuth_time, times.range_time, height=float(height))
+    for row in zip(line, sample, seen.latitude, seen.longitude, seen.incidence):
+        print("line {:8.1f}, sample {:8.1f}: {:.7f} N, {:.7f} E, incidence {:.4f} degrees".format(*row))
+
+
+if __name__ == "__main__":
+    main(*sys.argv[1:])
