@@ -48,8 +48,10 @@ struct LaneFft {
 /** A transform along a row: its lanes are neighbours in step 1, results that are neighbours in step 2. */
 struct RowFft {
     LaneFft first, second;
-    const float* turns = nullptr;  ///< of step 1, a slot for each result of each pack of lanes
-    std::ptrdiff_t pitch = 0;      ///< floats from one result of step 1 to the next
+    const float* turns = nullptr;    ///< of step 1, a slot for each result of each pack of lanes
+    const FftRoot* packs = nullptr;  ///< if any, the turns are those of the first pack, and these are by what
+                                     ///< the results of each pack are turned beyond
+    std::ptrdiff_t pitch = 0;        ///< floats from one result of step 1 to the next
     std::ptrdiff_t tile = 0, lanes = 0;
 };
 

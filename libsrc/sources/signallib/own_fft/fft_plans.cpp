@@ -23,14 +23,20 @@ struct RadixCost {
 constexpr RadixCost kRadixCosts[] = {{16, 30.0}, {15, 38.0}, {14, 42.0}, {12, 28.0}, {10, 26.0},
                                      {9, 27.0},  {8, 21.0},  {7, 27.0},  {6, 21.0},  {5, 21.0},
                                      {4, 17.0},  {3, 18.0},  {2, 15.0}};
-/** Exchanging lanes and slots. */
-constexpr double kTransposeCost = 20.0;
+/** Through a buffer of its own. */
+constexpr double kMoved = 20.0;
+/** Slots that begin within a line of the cache. */
+constexpr double kUnaligned = 4.0;
+/** For each sample of a step, whose buffers may lie beyond the first cache. */
+constexpr double kPerSample = 0.1;
 /** Lengths up to this one are transformed in one step, whose buffers the first cache holds. */
 constexpr int kOneStep = 128;
 /** The same of the lanes along a row, one pack of them at a time. */
 constexpr int kOneRowStep = 2048;
+/** Rows whose turns, kept whole, would come from memory. */
+constexpr int kLongRow = 1 << 17;
 /** Short rows up to this length, eight at a time, leave room in the first cache. */
-constexpr int kCachedShortRow = 250;
+constexpr int kCachedShortRow = 320;
 
 struct Passes {
     double cost = 0.0;
@@ -69,18 +75,24 @@ int packs_of(int count, int lanes) { return count / lanes + (count % lanes != 0 
  * packs of one. The cost is that of one value. */
 Split split(PassChoice& passes, int length, int lanes) {
     Split best;
-    // Buffers beyond the first cache cost something: of columns a whole strip stands in them.
-    const double per_step = lanes == 1 ? 0.1 : 0.004;
-    constexpr double kMoved = 15.0;  // through a stage of a step's own
-    const auto step = [&](int steps) {
-        const bool moved = lanes > 1 && steps > kOneRowStep / lanes;
-        return passes.of(steps).cost + per_step * steps + (moved ? kMoved : 0.0);
+    const bool rows = lanes > 1;
+    const auto first_cost = [&](int first, int second) {
+        const bool moved = rows && first > kOneRowStep / lanes, unaligned = rows && second % 8 != 0;
+        return passes.of(first).cost + kPerSample * first + (moved ? kMoved : 0.0) +
+               (unaligned ? kUnaligned : 0.0);
+    };
+    const auto second_cost = [&](int second) {
+        const Passes& own = passes.of(second);
+        // Lanes and slots are exchanged on the way into a single pass, otherwise through the buffer before the
+        // next.
+        const int moves = rows ? (own.radices.size() > 1 ? 1 : 0) + (second > kOneRowStep / lanes ? 1 : 0) : 0;
+        return own.cost + kPerSample * second + kMoved * moves;
     };
     const auto filled = [&](int count) { return static_cast<double>(packs_of(count, lanes)) * lanes / count; };
     for (int second = lanes; second <= length / lanes && second / 64 <= length / second; ++second) {
         const int first = length / second;
         if (length % second != 0) continue;
-        const double cost = filled(second) * step(first) + filled(first) * (step(second) + kTransposeCost);
+        const double cost = filled(second) * first_cost(first, second) + filled(first) * second_cost(second);
         if (cost < best.cost) best = {cost, second};
     }
     return best;
@@ -88,12 +100,11 @@ Split split(PassChoice& passes, int length, int lanes) {
 
 /** The same of rows that stand in one lane each: they take no turns. */
 double short_rows_cost(PassChoice& passes, int length) {
-    const double cost = passes.of(length).cost;
-    return length <= kCachedShortRow ? cost : cost + 21.0 + 0.1 * std::max(length - 400, 0);
+    return passes.of(length).cost + 0.05 * std::max(length - kCachedShortRow, 0);
 }
 
 /** What an operation takes on a vector of so many lanes. */
-double lane_weight(int lanes) { return lanes == 16 ? 1.0 : lanes == 8 ? 0.55 : 0.5; }
+double lane_weight(int lanes) { return lanes == 16 ? 1.0 : lanes == 8 ? 0.53 : 0.5; }
 
 // ---- Roots ----
 
@@ -177,8 +188,8 @@ FftKind choose_fft(const FftGeometry& geometry, int widest) {
 }
 
 std::size_t fft_bytes(const FftKind& kind) noexcept {
-    // At most two buffers, a stage, a tile of some packs and the roots; of rows the turns and the tile alone are of
-    // their size.
+    // At most two buffers, a stage, a tile of some packs and the roots; of rows the turns and the tile alone are
+    // of their size.
     const auto samples = static_cast<std::size_t>(kind.length) * 2 * sizeof(float);
     const auto lanes = static_cast<std::size_t>(kind.lanes);
     const std::size_t copies = kind.way != FftWay::Rows ? 4 * lanes + 1 : 4;
@@ -269,26 +280,32 @@ RowFft FftTables::along_row() {
     row.second = down_lanes(second, 1);
     row.pitch = 16 * (second / 8 | 1) + (second % 8 != 0 ? 32 : 0);  // whole lines of the cache, an odd number
     row.tile = first * row.pitch;
-    row.lanes = row.second.two_steps() ? second * slot : 0;
     turn_lanes(row);
+    row.lanes = std::max(row.second.two_steps() ? second : 0, row.packs ? first : 0) * slot;
     return row;
 }
 
 void FftTables::turn_lanes(RowFft& row) {
     const int first = row.first.length(), second = row.second.length(), lanes = kind_.lanes;
-    const int hop = row.first.two_steps() ? row.first.first.length : 1;
+    const int packs = packs_of(second, lanes), hop = row.first.two_steps() ? row.first.first.length : 1;
     const Roots root{kind_.length, kind_.forward};
-    turns_.reserve(static_cast<std::size_t>(packs_of(second, lanes)) * static_cast<std::size_t>(first) * 2 *
+    const auto result = [&](int k) {
+        return k % hop + std::int64_t{hop} * result_of(k / hop, first / hop, kind_.forward);
+    };
+    const int whole = kind_.length < kLongRow ? packs : 1;
+    turns_.reserve(static_cast<std::size_t>(whole) * static_cast<std::size_t>(first) * 2 *
                    static_cast<std::size_t>(lanes));
-    for (int b = 0; b < packs_of(second, lanes); ++b)
-        for (int k = 0; k < first; ++k) {
-            const std::int64_t result =
-                k % hop + std::int64_t{hop} * result_of(k / hop, first / hop, kind_.forward);
+    for (int b = 0; b < whole; ++b)
+        for (int k = 0; k < first; ++k)
             for (const auto part : {&FftRoot::re, &FftRoot::im})
                 for (int i = 0; i < lanes; ++i)
-                    turns_.push_back(root(result * (lane_of(b, lanes, second) + i)).*part);
-        }
+                    turns_.push_back(root(result(k) * (lane_of(b, lanes, second) + i)).*part);
     row.turns = turns_.data();
+    if (whole == packs) return;
+    std::vector<FftRoot> of_packs;
+    for (int b = 0; b < packs; ++b)
+        for (int k = 0; k < first; ++k) of_packs.push_back(root(result(k) * lane_of(b, lanes, second)));
+    row.packs = keep(std::move(of_packs));
 }
 
 std::size_t FftTables::bytes() const noexcept {

@@ -421,13 +421,22 @@ struct LaneFfts {
     /** First of a pack's lanes: the last pack overlaps the one before it. */
     QUO_FFT_INLINE int lane_of(int pack, int count) { return (pack + 1) * W <= count ? pack * W : count - W; }
 
+    /** What the results of a pack are turned by, in `room` if they are not kept. */
+    static const float* turns_of(const RowFft& fft, int pack, float* room) {
+        const int n2 = fft.first.length();
+        const std::ptrdiff_t at = std::ptrdiff_t{pack} * n2;
+        if (!fft.packs) return fft.turns + at * kSlot;
+        for (int k = 0; k < n2; ++k)
+            save<false>(turn(load<false>(fft.turns + k * kSlot), fft.packs[at + k]), room + k * kSlot);
+        return room;
+    }
     /** Step 1: what it leaves is a row of the tile for each of its results. */
     static void across_samples(const RowFft& fft, const float* in, float* tile, float* room) {
-        const int n1 = fft.second.length(), n2 = fft.first.length();
+        const int n1 = fft.second.length();
         for (int b = 0; b * W < n1; ++b) {
             const std::ptrdiff_t first = 2 * lane_of(b, n1);
             one_pack(fft.first, {in + first, 2 * std::ptrdiff_t{n1}, kInterleaved},
-                     {tile + first, fft.pitch, kInterleaved}, fft.turns + std::ptrdiff_t{b} * n2 * kSlot, room);
+                     {tile + first, fft.pitch, kInterleaved}, turns_of(fft, b, room), room + fft.lanes);
         }
     }
     /** Step 2: W rows of the tile are the lanes. */
