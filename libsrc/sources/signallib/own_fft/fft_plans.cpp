@@ -276,12 +276,12 @@ RowFft FftTables::along_row() {
     RowFft row;
     const int second = split(passes, kind_.length, kind_.lanes).second, first = kind_.length / second;
     const std::ptrdiff_t slot = 2 * std::ptrdiff_t{kind_.lanes};
-    row.first = down_lanes(first, 1);
-    row.second = down_lanes(second, 1);
+    row.first = down_lanes(first, kStripPacks);
+    row.second = down_lanes(second, kStripPacks);
     row.pitch = 16 * (second / 8 | 1) + (second % 8 != 0 ? 32 : 0);  // whole lines of the cache, an odd number
     row.tile = first * row.pitch;
     turn_lanes(row);
-    row.lanes = std::max(row.second.two_steps() ? second : 0, row.packs ? first : 0) * slot;
+    row.lanes = std::max(row.second.two_steps() ? second : 0, row.packs ? first : 0) * kStripPacks * slot;
     return row;
 }
 

@@ -317,10 +317,12 @@ struct LaneFfts {
         }
     }
 
-    /** `packs` packs of columns in two steps. Interleaved slots pass through a stage of `floats` floats a row. */
+    /** `packs` packs of columns in two steps, those that are split one behind the other. Interleaved slots pass
+     * through a stage of `floats` floats a row. */
     static void two_steps(const LaneFft& fft, From in, To out, int packs, std::ptrdiff_t floats,
                           const float* turns, float* room) {
         const int n1 = fft.second.length, n2 = fft.first.length;
+        const std::ptrdiff_t pack = fft.length() * kSlot;
         float *const work = room, *const stage = work + fft.work, *const tile = stage + fft.stage;
         const std::ptrdiff_t stage_step = packs * kSlot, tile_row = packs * fft.pitch * kSlot;
         for (int i = 0; i < n1; ++i) {
@@ -329,8 +331,9 @@ struct LaneFfts {
                 if (i + 1 < n1) ask_first(in.at + (i + 1) * in.step, n1 * in.step, n2, floats);
             }
             for (int b = 0; b < packs; ++b) {
-                const From from = in.form == kInterleaved ? From{stage + b * kSlot, stage_step, kInterleaved}
-                                                          : From{in.at + i * in.step, n1 * in.step, kSplit};
+                const From from = in.form == kInterleaved
+                                      ? From{stage + b * kSlot, stage_step, kInterleaved}
+                                      : From{in.at + b * pack + i * in.step, n1 * in.step, kSplit};
                 run(fft.first, from, {tile + (b * fft.pitch + i) * kSlot, tile_row, kSplit},
                     {fft.outer + std::ptrdiff_t{i} * n2}, work);
             }
@@ -340,13 +343,13 @@ struct LaneFfts {
             for (int b = 0; b < packs; ++b)
                 run(fft.second, {tile + (k * packs + b) * fft.pitch * kSlot, kSlot, kSplit},
                     {stage + b * kSlot, stage_step, kInterleaved},
-                    {nullptr, turns ? turns + k * kSlot : nullptr, n2 * kSlot}, work);
+                    {nullptr, turns ? turns + b * pack + k * kSlot : nullptr, n2 * kSlot}, work);
             move(stage, stage_step, out.at + k * out.step, n2 * out.step, n1, floats);
         }
     }
-    /** One whole pack. */
-    static void one_pack(const LaneFft& fft, From in, To out, const float* turns, float* room) {
-        if (fft.two_steps()) return two_steps(fft, in, out, 1, kSlot, turns, room);
+    /** Whole packs: more than one in two steps only. */
+    static void whole_packs(const LaneFft& fft, From in, To out, int packs, const float* turns, float* room) {
+        if (fft.two_steps()) return two_steps(fft, in, out, packs, packs * kSlot, turns, room);
         run(fft.first, in, out, {nullptr, turns}, room);
     }
     /** Columns that fill no pack. */
@@ -367,7 +370,7 @@ struct LaneFfts {
             if (fft.two_steps())
                 two_steps(fft, in, out, (some + W - 1) / W, floats, nullptr, room);
             else if (some == W)
-                one_pack(fft, in, out, nullptr, room);
+                whole_packs(fft, in, out, 1, nullptr, room);
             else
                 part_pack(fft, in, out, floats, room);
         }
@@ -421,22 +424,28 @@ struct LaneFfts {
     /** First of a pack's lanes: the last pack overlaps the one before it. */
     QUO_FFT_INLINE int lane_of(int pack, int count) { return (pack + 1) * W <= count ? pack * W : count - W; }
 
-    /** What the results of a pack are turned by, in `room` if they are not kept. */
-    static const float* turns_of(const RowFft& fft, int pack, float* room) {
+    /** Packs that are moved together from the one that begins at `lane`. */
+    QUO_FFT_INLINE int strip_of(const LaneFft& fft, int lane, int count) {
+        return fft.two_steps() && lane + kStripPacks * W <= count ? kStripPacks : 1;
+    }
+    /** What the results of some packs are turned by, in `room` if they are not kept. */
+    static const float* turns_of(const RowFft& fft, int pack, int packs, float* room) {
         const int n2 = fft.first.length();
         const std::ptrdiff_t at = std::ptrdiff_t{pack} * n2;
         if (!fft.packs) return fft.turns + at * kSlot;
-        for (int k = 0; k < n2; ++k)
-            save<false>(turn(load<false>(fft.turns + k * kSlot), fft.packs[at + k]), room + k * kSlot);
+        for (int k = 0; k < packs * n2; ++k)
+            save<false>(turn(load<false>(fft.turns + k % n2 * kSlot), fft.packs[at + k]), room + k * kSlot);
         return room;
     }
     /** Step 1: what it leaves is a row of the tile for each of its results. */
     static void across_samples(const RowFft& fft, const float* in, float* tile, float* room) {
         const int n1 = fft.second.length();
-        for (int b = 0; b * W < n1; ++b) {
-            const std::ptrdiff_t first = 2 * lane_of(b, n1);
-            one_pack(fft.first, {in + first, 2 * std::ptrdiff_t{n1}, kInterleaved},
-                     {tile + first, fft.pitch, kInterleaved}, turns_of(fft, b, room), room + fft.lanes);
+        for (int b = 0, packs = 0; b * W < n1; b += packs) {
+            const int lane = lane_of(b, n1);
+            packs = strip_of(fft.first, lane, n1);
+            whole_packs(fft.first, {in + 2 * lane, 2 * std::ptrdiff_t{n1}, kInterleaved},
+                        {tile + 2 * lane, fft.pitch, kInterleaved}, packs, turns_of(fft, b, packs, room),
+                        room + fft.lanes);
         }
     }
     /** Step 2: W rows of the tile are the lanes. */
@@ -446,14 +455,18 @@ struct LaneFfts {
         if (!fft.second.two_steps() && fft.second.first.passes == 1)
             return run(fft.second.first, {tile, fft.pitch, kAcross}, {out, step, kInterleaved}, {}, room);
         float *const lanes = room, *const rest = room + fft.lanes;
-        for (int c = 0; c * W < n2; ++c) {
+        for (int c = 0, packs = 0; c * W < n2; c += packs) {
             const int result = lane_of(c, n2);
+            packs = strip_of(fft.second, result, n2);
             From from{tile + result * fft.pitch, fft.pitch, kAcross};
             if (fft.second.two_steps()) {
-                row_kernels(1).in({1, n1, 1, nullptr}, {from.at, lanes, lanes, from.step});
+                for (int b = 0; b < packs; ++b, from.at += W * from.step) {
+                    float* const to = lanes + b * std::ptrdiff_t{n1} * kSlot;
+                    row_kernels(1).in({1, n1, 1, nullptr}, {from.at, to, to, from.step});
+                }
                 from = {lanes, kSlot, kSplit};
             }
-            one_pack(fft.second, from, {out + 2 * result, step, kInterleaved}, nullptr, rest);
+            whole_packs(fft.second, from, {out + 2 * result, step, kInterleaved}, packs, nullptr, rest);
         }
     }
     static void rows(const RowFft& fft, const FftRows& rows, float* room) noexcept {
