@@ -58,7 +58,7 @@ struct LaneFfts {
     QUO_FFT_INLINE C subtract(C a, C b) { return {a.re - b.re, a.im - b.im}; }
     template <class Root>
     QUO_FFT_INLINE C turn(C a, const Root& by) {
-        const V re = V{} + by.re, im = V{} + by.im;
+        const V re = by.re - V{}, im = by.im - V{};  // not 0 +, which would be computed: it turns -0 into 0
         return {fused(-a.im, im, a.re * re), fused(a.im, re, a.re * im)};
     }
     /** Turned by exp(-2 pi i K / N). */
@@ -437,12 +437,16 @@ struct LaneFfts {
             save<false>(turn(load<false>(fft.turns + k % n2 * kSlot), fft.packs[at + k]), room + k * kSlot);
         return room;
     }
-    /** Step 1: what it leaves is a row of the tile for each of its results. */
-    static void across_samples(const RowFft& fft, const float* in, float* tile, float* room) {
+    /** Step 1: what it leaves is a row of the tile for each of its results. The `next` row is asked for on the
+     * way, into the second cache: all at once it would keep what this one needs waiting. */
+    static void across_samples(const RowFft& fft, const float* in, const float* next, float* tile, float* room) {
+        constexpr std::ptrdiff_t kMostAsked = 1 << 15;
         const int n1 = fft.second.length();
+        const std::ptrdiff_t share = fft.first.length() * kSlot;
         for (int b = 0, packs = 0; b * W < n1; b += packs) {
             const int lane = lane_of(b, n1);
             packs = strip_of(fft.first, lane, n1);
+            if (b * share < kMostAsked) ask<2>(next + b * share, packs * share);
             whole_packs(fft.first, {in + 2 * lane, 2 * std::ptrdiff_t{n1}, kInterleaved},
                         {tile + 2 * lane, fft.pitch, kInterleaved}, packs, turns_of(fft, b, packs, room),
                         room + fft.lanes);
@@ -470,14 +474,10 @@ struct LaneFfts {
         }
     }
     static void rows(const RowFft& fft, const FftRows& rows, float* room) noexcept {
-        constexpr std::ptrdiff_t kMostAsked = 1 << 15;
-        const std::ptrdiff_t floats = 2 * std::ptrdiff_t{fft.first.length()} * fft.second.length();
         float* const rest = room + fft.tile;
         for (std::ptrdiff_t row = 0; row < rows.count; ++row) {
             const float* const in = rows.in + row * rows.distance;
-            // Into the second cache: asked for at once, the next row comes while this one is transformed.
-            if (row + 1 < rows.count) ask<2>(in + rows.distance, floats < kMostAsked ? floats : kMostAsked);
-            across_samples(fft, in, room, rest);
+            across_samples(fft, in, row + 1 < rows.count ? in + rows.distance : in, room, rest);
             across_results(fft, room, rows.out + row * rows.distance, rest);
         }
     }
