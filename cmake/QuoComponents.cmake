@@ -152,8 +152,8 @@ function(quo_bench name)
     target_link_libraries(${target} PRIVATE ${arg_LINK} benchmark::benchmark)
 endfunction()
 
-# quo_fuzz(name SOURCES ... COMPONENTS component ...): one libFuzzer target, seeded from fuzz/corpus/<name>, and part
-# of the target fuzz_targets.
+# quo_fuzz(name SOURCES ... COMPONENTS component ...): one libFuzzer target, seeded from fuzz/corpus/<name>, part of
+# the target fuzz_targets, and a test that runs it for a few seconds.
 function(quo_fuzz name)
     cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "SOURCES;COMPONENTS")
     set(target ${name}_fuzz)
@@ -161,6 +161,7 @@ function(quo_fuzz name)
     quo_link_components(${target} ${arg_COMPONENTS})
     target_link_options(${target} PRIVATE -fsanitize=fuzzer)
     add_dependencies(fuzz_targets ${target})
+    add_test(NAME fuzz.${name} COMMAND "${PROJECT_SOURCE_DIR}/scripts/fuzz.sh" 0.06 "$<TARGET_FILE:${target}>")
 endfunction()
 
 function(quo_add_existing folder)

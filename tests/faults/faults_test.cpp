@@ -206,6 +206,7 @@ void Bench::be_tool() const {
     std::vector<char*> arguments;
     for (std::string& word : words) arguments.push_back(word.data());
     arguments.push_back(nullptr);
+    setenv("TMPDIR", beside_.path().c_str(), 1);  // what it leaves there when it is killed
     setenv("LD_PRELOAD", QUO_FAULTS, 1);
     setenv("QUO_FFT_ENGINE", "fftw", 1);
     setenv(test::kWatchVariable, std::to_string(shared_).c_str(), 1);

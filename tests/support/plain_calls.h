@@ -212,8 +212,8 @@ inline void PlainSession::run(const char* script, Calls calls) {
     calls["leads"] = [](auto& words, auto& told) { return told = shown(fs::read_symlink(words.text(1))), 0; };
     calls["report"] = [this](auto&, auto& told) { return tell_entries(told); };
     for (const auto& [name, call] : Calls{calls}) {
-        calls["ends:" + name] = [call](auto& words, auto& told) { return ended(call, words, told); };
-        calls["starves:" + name] = [this, call](auto& words, auto& told) {
+        calls["ends:" + name] = [call = call](auto& words, auto& told) { return ended(call, words, told); };
+        calls["starves:" + name] = [this, call = call](auto& words, auto& told) {
             fail_every_allocation([&] { return told.clear(), static_cast<int>(call(words, told)); });
             return told_ = report_.entries().size(), 0;
         };

@@ -5,7 +5,7 @@
 namespace quo {
 namespace {
 
-TrackedBlocks first;
+TrackedBlocks oldest;
 
 bool take(TrackedBlocks& blocks) noexcept {
     return !std::atomic_ref<bool>{blocks.in_use}.exchange(true, std::memory_order_acquire);
@@ -13,7 +13,7 @@ bool take(TrackedBlocks& blocks) noexcept {
 
 /** Puts one behind the first, where readers of the list find it from now on. */
 void publish(TrackedBlocks& fresh) noexcept {
-    std::atomic_ref<TrackedBlocks*> place{first.next};
+    std::atomic_ref<TrackedBlocks*> place{oldest.next};
     fresh.next = place.load(std::memory_order_relaxed);
     while (!place.compare_exchange_weak(fresh.next, &fresh, std::memory_order_release)) {
     }
@@ -21,14 +21,14 @@ void publish(TrackedBlocks& fresh) noexcept {
 
 }  // namespace
 
-TrackedBlocks& first_tracked_blocks() noexcept { return first; }
+TrackedBlocks& first_tracked_blocks() noexcept { return oldest; }
 
 TrackedBlocks* after(TrackedBlocks& blocks) noexcept {
     return std::atomic_ref<TrackedBlocks*>{blocks.next}.load(std::memory_order_acquire);
 }
 
 TrackedBlocks* take_tracked_blocks() noexcept {
-    for (TrackedBlocks* blocks = &first; blocks; blocks = after(*blocks)) {
+    for (TrackedBlocks* blocks = &oldest; blocks; blocks = after(*blocks)) {
         if (take(*blocks)) return blocks;
     }
     auto* const fresh = static_cast<TrackedBlocks*>(std::calloc(1, sizeof(TrackedBlocks)));
