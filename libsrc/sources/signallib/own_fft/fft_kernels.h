@@ -49,8 +49,9 @@ struct LaneFft {
 struct RowFft {
     LaneFft first, second;
     const float* turns = nullptr;    ///< of step 1, a slot for each result of each pack of lanes
-    const FftRoot* packs = nullptr;  ///< long rows: what a pack's turns are multiplied by; `turns` holds one pack
-    std::ptrdiff_t pitch = 0;        ///< slots from one pack to the next
+    const FftRoot* packs = nullptr;  ///< if any, the turns are those of the first pack, and these are by what
+                                     ///< the results of each pack are turned beyond
+    std::ptrdiff_t pitch = 0;        ///< floats from one result of step 1 to the next
     std::ptrdiff_t tile = 0, lanes = 0;
 };
 
@@ -75,7 +76,7 @@ struct FftKernels {
     int width;  ///< lanes
     void (*columns)(const LaneFft& fft, const FftColumns& columns, float* room) noexcept;
     void (*rows)(const RowFft& fft, const FftRows& rows, float* room) noexcept;
-    /** Short rows, as many at a time as there are lanes. */
+    /** Short rows, as many at a time as there are lanes. Null where fewer lanes are as fast. */
     void (*short_rows)(const LaneFft& fft, const FftRows& rows, float* room) noexcept;
 };
 

@@ -23,16 +23,20 @@ struct RadixCost {
 constexpr RadixCost kRadixCosts[] = {{16, 30.0}, {15, 38.0}, {14, 42.0}, {12, 28.0}, {10, 26.0},
                                      {9, 27.0},  {8, 21.0},  {7, 27.0},  {6, 21.0},  {5, 21.0},
                                      {4, 17.0},  {3, 18.0},  {2, 15.0}};
-/** Exchanging lanes and slots. */
-constexpr double kTransposeCost = 20.0;
+/** Through a buffer of its own. */
+constexpr double kMoved = 20.0;
+/** Slots that begin within a line of the cache. */
+constexpr double kUnaligned = 4.0;
+/** For each sample of a step, whose buffers may lie beyond the first cache. */
+constexpr double kPerSample = 0.1;
 /** Lengths up to this one are transformed in one step, whose buffers the first cache holds. */
 constexpr int kOneStep = 128;
-/** More would not make short rows faster: loads and stores of their samples take most of the time. */
-constexpr int kShortRowLanes = 8;
+/** The same of the lanes along a row, one pack of them at a time. */
+constexpr int kOneRowStep = 2048;
+/** Rows whose turns, kept whole, would come from memory. */
+constexpr int kLongRow = 1 << 17;
 /** Short rows up to this length, eight at a time, leave room in the first cache. */
-constexpr int kCachedShortRow = 256;
-/** Rows whose turns are kept for one pack of lanes only. */
-constexpr int kLongRow = 1 << 16;
+constexpr int kCachedShortRow = 320;
 
 struct Passes {
     double cost = 0.0;
@@ -71,14 +75,24 @@ int packs_of(int count, int lanes) { return count / lanes + (count % lanes != 0 
  * packs of one. The cost is that of one value. */
 Split split(PassChoice& passes, int length, int lanes) {
     Split best;
-    // Buffers beyond the first cache cost something: of columns a whole strip stands in them.
-    const double per_step = lanes == 1 ? 0.1 : 0.004;
-    const auto step = [&](int steps) { return passes.of(steps).cost + per_step * steps; };
+    const bool rows = lanes > 1;
+    const auto first_cost = [&](int first, int second) {
+        const bool moved = rows && first > kOneRowStep / lanes, unaligned = rows && second % 8 != 0;
+        return passes.of(first).cost + kPerSample * first + (moved ? kMoved : 0.0) +
+               (unaligned ? kUnaligned : 0.0);
+    };
+    const auto second_cost = [&](int second) {
+        const Passes& own = passes.of(second);
+        // Lanes and slots are exchanged on the way into a single pass, otherwise through the buffer before the
+        // next.
+        const int moves = rows ? (own.radices.size() > 1 ? 1 : 0) + (second > kOneRowStep / lanes ? 1 : 0) : 0;
+        return own.cost + kPerSample * second + kMoved * moves;
+    };
     const auto filled = [&](int count) { return static_cast<double>(packs_of(count, lanes)) * lanes / count; };
     for (int second = lanes; second <= length / lanes && second / 64 <= length / second; ++second) {
         const int first = length / second;
         if (length % second != 0) continue;
-        const double cost = filled(second) * step(first) + filled(first) * (step(second) + kTransposeCost);
+        const double cost = filled(second) * first_cost(first, second) + filled(first) * second_cost(second);
         if (cost < best.cost) best = {cost, second};
     }
     return best;
@@ -90,7 +104,7 @@ double short_rows_cost(PassChoice& passes, int length) {
 }
 
 /** What an operation takes on a vector of so many lanes. */
-double lane_weight(int lanes) { return lanes == 16 ? 1.0 : lanes == 8 ? 0.65 : 0.5; }
+double lane_weight(int lanes) { return lanes == 16 ? 1.0 : lanes == 8 ? 0.53 : 0.5; }
 
 // ---- Roots ----
 
@@ -119,15 +133,8 @@ private:
     std::vector<Exact> fine_, coarse_;
 };
 
-/** roots[i * inner + k] = root(i * k). */
-std::vector<FftRoot> root_table(int n, bool forward, int outer, int inner, int first = 0) {
-    const Roots root{n, forward};
-    std::vector<FftRoot> table;
-    table.reserve(static_cast<std::size_t>(outer) * static_cast<std::size_t>(inner - first));
-    for (std::int64_t i = 0; i < outer; ++i)
-        for (std::int64_t k = first; k < inner; ++k) table.push_back(root(i * k));
-    return table;
-}
+/** The result that the k-th slot of `count` leaves a transform as: backward ones leave in the opposite order. */
+int result_of(int k, int count, bool forward) { return forward || k == 0 ? k : count - k; }
 
 /** First of a pack's lanes: the last pack overlaps the one before it. */
 int lane_of(int pack, int lanes, int count) { return std::min(pack * lanes, count - lanes); }
@@ -136,14 +143,16 @@ int lane_of(int pack, int lanes, int count) { return std::min(pack * lanes, coun
 
 extern const FftKernels kFftKernels4;
 #if defined(QUO_WIDE_LANES)
-extern const FftKernels kFftKernels8, kFftKernels16;
+extern const FftKernels kFftKernels8, kFftKernels8Avx512, kFftKernels16;
 #endif
 
 const FftKernels* fft_kernels(int lanes) noexcept {
     if (lanes == 4) return &kFftKernels4;
 #if defined(QUO_WIDE_LANES)
-    if (lanes == 8 && processor_level() >= ProcessorLevel::kAvx2) return &kFftKernels8;
-    if (lanes == 16 && processor_level() >= ProcessorLevel::kAvx512) return &kFftKernels16;
+    const ProcessorLevel level = processor_level();
+    if (lanes == 16 && level == ProcessorLevel::kAvx512) return &kFftKernels16;
+    if (lanes == 8 && level == ProcessorLevel::kAvx512) return &kFftKernels8Avx512;  // with twice the registers
+    if (lanes == 8 && level == ProcessorLevel::kAvx2) return &kFftKernels8;
 #endif
     return nullptr;
 }
@@ -172,19 +181,18 @@ FftKind choose_fft(const FftGeometry& geometry, int widest) {
         }
         // The number of rows must not matter: a row has the same bits among others as alone.
         offer(FftWay::Rows, lanes, split(passes, geometry.length, lanes).cost);
-        if (lanes <= kShortRowLanes) offer(FftWay::ShortRows, lanes, short_rows_cost(passes, geometry.length));
+        if (fft_kernels(lanes)->short_rows)
+            offer(FftWay::ShortRows, lanes, short_rows_cost(passes, geometry.length));
     }
-    // Short rows have the same bits in lanes of any number.
-    if (best.way == FftWay::ShortRows && geometry.count <= 4) best.lanes = 4;
     return best;
 }
 
 std::size_t fft_bytes(const FftKind& kind) noexcept {
-    // At most two buffers, a stage, a tile of some packs and the roots; of long rows the tile alone is of their
-    // size.
+    // At most two buffers, a stage, a tile of some packs and the roots; of rows the turns and the tile alone are
+    // of their size.
     const auto samples = static_cast<std::size_t>(kind.length) * 2 * sizeof(float);
     const auto lanes = static_cast<std::size_t>(kind.lanes);
-    const std::size_t copies = kind.way != FftWay::Rows ? 4 * lanes + 1 : kind.length > kLongRow ? 2 : 4;
+    const std::size_t copies = kind.way != FftWay::Rows ? 4 * lanes + 1 : 4;
     return copies * samples + (std::size_t{1} << 19);
 }
 
@@ -223,8 +231,13 @@ ShortFft FftTables::take_apart(int length) {
     int left = length;
     for (const int radix : passes.of(length).radices) {
         const int count = left / radix;
-        const FftRoot* const roots = count > 1 ? keep(root_table(left, true, count, radix, 1)) : nullptr;
-        fft.pass[fft.passes++] = {radix, count, length / left, roots};
+        std::vector<FftRoot> roots;
+        if (count > 1) {
+            const Roots root{left, true};
+            for (int i = 0; i < count; ++i)
+                for (int k = 1; k < radix; ++k) roots.push_back(root(std::int64_t{i} * k));
+        }
+        fft.pass[fft.passes++] = {radix, count, length / left, keep(std::move(roots))};
         left = count;
     }
     if (fft.passes == 0) fft.pass[fft.passes++] = {1, 1, 1, nullptr};  // one sample is its own transform
@@ -234,7 +247,8 @@ ShortFft FftTables::take_apart(int length) {
 LaneFft FftTables::down_lanes(int length, int packs) {
     LaneFft fft;
     const std::ptrdiff_t slot = 2 * std::ptrdiff_t{kind_.lanes};
-    if (length <= kOneStep || kind_.way == FftWay::ShortRows) {
+    const int most = kind_.way == FftWay::Rows ? kOneRowStep / kind_.lanes : kOneStep;
+    if (length <= most || kind_.way == FftWay::ShortRows) {
         fft.first = take_apart(length);
         fft.stage = length * slot;
         fft.work = 2 * fft.stage;
@@ -244,7 +258,12 @@ LaneFft FftTables::down_lanes(int length, int packs) {
     const int second = split(passes, length, 1).second, first = length / second;
     fft.first = take_apart(first);
     fft.second = take_apart(second);
-    fft.outer = keep(root_table(length, kind_.forward, second, first));
+    const Roots root{length, kind_.forward};
+    std::vector<FftRoot> outer;
+    for (std::int64_t i = 0; i < second; ++i)
+        for (int k = 0; k < first; ++k) outer.push_back(root(i * result_of(k, first, kind_.forward)));
+    fft.outer = keep(std::move(outer));
+
     fft.pitch = second | 1;  // an even one would have slots share a few lines of the cache
     fft.work = 2 * std::max(first, second) * slot;
     fft.stage = std::max(first, second) * slot * packs;
@@ -257,31 +276,35 @@ RowFft FftTables::along_row() {
     RowFft row;
     const int second = split(passes, kind_.length, kind_.lanes).second, first = kind_.length / second;
     const std::ptrdiff_t slot = 2 * std::ptrdiff_t{kind_.lanes};
-    row.first = down_lanes(first, 1);
-    row.second = down_lanes(second, 1);
-    row.pitch = first | 1;
-    row.tile = packs_of(second, kind_.lanes) * row.pitch * slot;
-    row.lanes = second * slot;
+    row.first = down_lanes(first, kStripPacks);
+    row.second = down_lanes(second, kStripPacks);
+    row.pitch = 16 * (second / 8 | 1) + (second % 8 != 0 ? 32 : 0);  // whole lines of the cache, an odd number
+    row.tile = first * row.pitch;
     turn_lanes(row);
+    row.lanes = std::max(row.second.two_steps() ? second : 0, row.packs ? first : 0) * kStripPacks * slot;
     return row;
 }
 
 void FftTables::turn_lanes(RowFft& row) {
     const int first = row.first.length(), second = row.second.length(), lanes = kind_.lanes;
-    const int packs = packs_of(second, lanes);
-    const bool one_pack = kind_.length > kLongRow;
+    const int packs = packs_of(second, lanes), hop = row.first.two_steps() ? row.first.first.length : 1;
     const Roots root{kind_.length, kind_.forward};
-    turns_.reserve(static_cast<std::size_t>(one_pack ? 1 : packs) * static_cast<std::size_t>(first) * 2 *
+    const auto result = [&](int k) {
+        return k % hop + std::int64_t{hop} * result_of(k / hop, first / hop, kind_.forward);
+    };
+    const int whole = kind_.length < kLongRow ? packs : 1;
+    turns_.reserve(static_cast<std::size_t>(whole) * static_cast<std::size_t>(first) * 2 *
                    static_cast<std::size_t>(lanes));
-    for (int b = 0; b < (one_pack ? 1 : packs); ++b)
-        for (std::int64_t k = 0; k < first; ++k)
+    for (int b = 0; b < whole; ++b)
+        for (int k = 0; k < first; ++k)
             for (const auto part : {&FftRoot::re, &FftRoot::im})
-                for (int i = 0; i < lanes; ++i) turns_.push_back(root(k * (lane_of(b, lanes, second) + i)).*part);
+                for (int i = 0; i < lanes; ++i)
+                    turns_.push_back(root(result(k) * (lane_of(b, lanes, second) + i)).*part);
     row.turns = turns_.data();
-    if (!one_pack) return;
+    if (whole == packs) return;
     std::vector<FftRoot> of_packs;
     for (int b = 0; b < packs; ++b)
-        for (std::int64_t k = 0; k < first; ++k) of_packs.push_back(root(k * lane_of(b, lanes, second)));
+        for (int k = 0; k < first; ++k) of_packs.push_back(root(result(k) * lane_of(b, lanes, second)));
     row.packs = keep(std::move(of_packs));
 }
 

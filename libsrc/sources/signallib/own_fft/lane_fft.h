@@ -5,11 +5,15 @@
 #include <cstddef>
 #include <cstring>
 #include <utility>
+#if defined(__FMA__)
+#include <immintrin.h>
+#endif
 
+#include "sarutillib/ground/processor_level.h"
 #include "signallib/own_fft/fft_kernels.h"
 
-/* The kernels of fft_kernels.h for W lanes. Included once for every width, by a source with flags of its own;
- * whatever is not inlined carries the width in its name, so that no other source can take it for its own. */
+/* The kernels of fft_kernels.h for W lanes. Included once for every level and width, by a source with flags of its
+ * own; whatever is not inlined carries both in its name, so that no other source can take it for its own. */
 
 namespace quo {
 
@@ -24,11 +28,13 @@ struct ExactRoot {
     }
 };
 
-template <int W>
+template <int W, ProcessorLevel Level>
 struct LaneFfts {
     typedef float V __attribute__((vector_size(4 * W)));
     typedef float Loose __attribute__((vector_size(4 * W), aligned(4), may_alias));
     static constexpr std::ptrdiff_t kSlot = 2 * W;
+    /** Wider vectors would not make them faster: loads and stores of their samples take most of the time. */
+    static constexpr bool kShortRows = W <= 8;
 
 #define QUO_FFT_HERE __attribute__((always_inline))
 #define QUO_FFT_INLINE QUO_FFT_HERE static inline
@@ -39,11 +45,21 @@ struct LaneFfts {
     struct C {
         V re, im;
     };
+    /** a b + c, rounded once where the processor can: said here rather than left to the compiler, which would fuse
+     * otherwise with its next version. */
+    QUO_FFT_INLINE V fused(V a, V b, V c) {
+#if defined(__FMA__)
+        if constexpr (W == 16) return V(_mm512_fmadd_ps(__m512(a), __m512(b), __m512(c)));
+        if constexpr (W == 8) return V(_mm256_fmadd_ps(__m256(a), __m256(b), __m256(c)));
+#endif
+        return a * b + c;
+    }
     QUO_FFT_INLINE C add(C a, C b) { return {a.re + b.re, a.im + b.im}; }
     QUO_FFT_INLINE C subtract(C a, C b) { return {a.re - b.re, a.im - b.im}; }
     template <class Root>
     QUO_FFT_INLINE C turn(C a, const Root& by) {
-        return {a.re * by.re - a.im * by.im, a.re * by.im + a.im * by.re};
+        const V re = by.re - V{}, im = by.im - V{};  // not 0 +, which would be computed: it turns -0 into 0
+        return {fused(-a.im, im, a.re * re), fused(a.im, re, a.re * im)};
     }
     /** Turned by exp(-2 pi i K / N). */
     template <int K, int N>
@@ -57,7 +73,7 @@ struct LaneFfts {
         if constexpr (kEighths == 6) return {-a.im, a.re};
         if constexpr (kEighths == 1 || kEighths == 5) return {(a.re + a.im) * kRe, (a.im - a.re) * kRe};
         if constexpr (kEighths == 3 || kEighths == 7) return {(a.re - a.im) * kRe, (a.re + a.im) * kRe};
-        return {a.re * kRe - a.im * kIm, a.re * kIm + a.im * kRe};
+        return turn(a, FftRoot{kRe, kIm});
     }
 
     // --- Slots
@@ -144,10 +160,11 @@ struct LaneFfts {
             C even = x[0], odd{};
             each<kHalf>([&](auto j) QUO_FFT_HERE {
                 constexpr ExactRoot kRoot{(j + 1) * (k + 1) % R, R};
-                constexpr float kCosine = static_cast<float>(kRoot.re), kSine = static_cast<float>(-kRoot.im);
-                even = add(even, {sum[j].re * kCosine, sum[j].im * kCosine});
-                const C part{difference[j].im * kSine, difference[j].re * kSine};
-                odd = j == 0 ? part : add(odd, part);
+                const V cosine = V{} + static_cast<float>(kRoot.re), sine = V{} - static_cast<float>(kRoot.im);
+                const C across{difference[j].im, difference[j].re};
+                even = {fused(sum[j].re, cosine, even.re), fused(sum[j].im, cosine, even.im)};
+                odd = j == 0 ? C{across.re * sine, across.im * sine}
+                             : C{fused(across.re, sine, odd.re), fused(across.im, sine, odd.im)};
             });
             out[k + 1] = {even.re + odd.re, even.im - odd.im};
             out[R - 1 - k] = {even.re - odd.re, even.im + odd.im};
@@ -162,13 +179,20 @@ struct LaneFfts {
     // --- Passes
     // --------------------------------------------------------------------------------------------------
 
-    /** A pass from slots `in_step` apart to slots `out_step` apart. `zero` holds sample 0. */
+    /** What results are turned by, if anything: all lanes by one root, or each by its own, from slots `lanes_step`
+     * apart. */
+    struct Outer {
+        const FftRoot* roots = nullptr;
+        const float* lanes = nullptr;
+        std::ptrdiff_t lanes_step = kSlot;
+    };
+    /** A pass from slots `in_step` apart to slots `out_step` apart. `zero` takes result 0. */
     struct Route {
-        const float *zero, *in;
-        float* out;
-        std::ptrdiff_t in_step, out_step;
-        const FftRoot* outer;
-        const float* lanes;  ///< slots that stand as those of `out` do
+        const float* in;
+        float *out, *zero;
+        std::ptrdiff_t in_step, out_step = kSlot;
+        Outer outer{};
+        float sign = 1.0F;  ///< of imaginary parts that become lanes or come from them
     };
     enum Turns { kNone, kInner, kOuter, kLanes };
 
@@ -176,14 +200,14 @@ struct LaneFfts {
     static void pass(const FftPass& pass, const Route& route) {
         const std::ptrdiff_t in_hop = pass.count * pass.stride * route.in_step;
         const std::ptrdiff_t out_hop = pass.stride * route.out_step;
-        const FftRoot* roots = T == kOuter ? route.outer : pass.roots;
+        const std::ptrdiff_t lanes_step = route.outer.lanes_step, lanes_hop = pass.stride * lanes_step;
+        const FftRoot* roots = T == kOuter ? route.outer.roots : pass.roots;
         for (int p = 0; p < pass.count; ++p) {
             const float* from = route.in + std::ptrdiff_t{p} * pass.stride * route.in_step;
             float* to = route.out + std::ptrdiff_t{p} * R * out_hop;
             for (int q = 0; q < pass.stride; ++q, from += route.in_step, to += route.out_step) {
                 C x[R];
-                x[0] = load<InInterleaved>(p + q == 0 ? route.zero : from);
-                each<R - 1>([&](auto j) QUO_FFT_HERE { x[j + 1] = load<InInterleaved>(from + (j + 1) * in_hop); });
+                each<R>([&](auto j) QUO_FFT_HERE { x[j] = load<InInterleaved>(from + j * in_hop); });
                 butterfly<R>(x);
                 if constexpr (T == kInner)
                     each<R - 1>([&](auto k) QUO_FFT_HERE { x[k + 1] = turn(x[k + 1], roots[k]); });
@@ -191,9 +215,10 @@ struct LaneFfts {
                     each<R>([&](auto k) QUO_FFT_HERE { x[k] = turn(x[k], roots[q + k * pass.stride]); });
                 if constexpr (T == kLanes)
                     each<R>([&](auto k) QUO_FFT_HERE {
-                        x[k] = turn(x[k], load<false>(route.lanes + (to - route.out) + k * out_hop));
+                        x[k] = turn(x[k], load<false>(route.outer.lanes + q * lanes_step + k * lanes_hop));
                     });
-                each<R>([&](auto k) QUO_FFT_HERE { save<OutInterleaved>(x[k], to + k * out_hop); });
+                save<OutInterleaved>(x[0], T != kInner && q == 0 ? route.zero : to);
+                each<R - 1>([&](auto k) QUO_FFT_HERE { save<OutInterleaved>(x[k + 1], to + (k + 1) * out_hop); });
             }
             if constexpr (T == kInner) roots += R - 1;
         }
@@ -202,63 +227,63 @@ struct LaneFfts {
     using PassKernel = void (*)(const FftPass&, const Route&);
     using Radices = std::integer_sequence<int, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 12, 14, 15, 16>;
     static constexpr int kRadices = 17;
-    struct PassTable {
-        PassKernel of[kRadices];
-    };
     template <bool InInterleaved, bool OutInterleaved, Turns T, int... R>
-    static constexpr PassTable passes_of(std::integer_sequence<int, R...> /*radices*/) {
-        PassTable table{};
-        ((table.of[R] = pass<R, InInterleaved, OutInterleaved, T>), ...);
+    static constexpr std::array<PassKernel, kRadices> passes_of(std::integer_sequence<int, R...> /*radices*/) {
+        std::array<PassKernel, kRadices> table{};
+        ((table[R] = pass<R, InInterleaved, OutInterleaved, T>), ...);
         return table;
     }
     template <bool InInterleaved, bool OutInterleaved, Turns T>
     static PassKernel find(int radix) {
-        static constexpr PassTable kTable = passes_of<InInterleaved, OutInterleaved, T>(Radices{});
-        return kTable.of[radix];
+        static constexpr auto kTable = passes_of<InInterleaved, OutInterleaved, T>(Radices{});
+        return kTable[static_cast<std::size_t>(radix)];
     }
 
-    /** Where the slots of a transform stand. */
+    /** Where the slots of a transform stand: as they are, interleaved, or one lane a row of samples, each `step`
+     * after the last. */
+    enum Form { kSplit, kInterleaved, kAcross };
     template <class Float>
     struct Slots {
         Float* at;
         std::ptrdiff_t step;
-        bool interleaved;
-    };
-    /** What the results are turned by, if anything: all lanes by one root, or each by its own, from slots that
-     * stand as those of the results do. */
-    struct Outer {
-        const FftRoot* roots = nullptr;
-        const float* lanes = nullptr;
+        Form form;
     };
     using From = Slots<const float>;
     using To = Slots<float>;
 
-    static PassKernel last_pass(int radix, bool in, bool out, const Outer& outer) {
-        if (outer.lanes) return in ? find<true, false, kLanes>(radix) : find<false, false, kLanes>(radix);
-        if (outer.roots) return in ? find<true, false, kOuter>(radix) : find<false, false, kOuter>(radix);
-        if (in) return out ? find<true, true, kNone>(radix) : find<true, false, kNone>(radix);
-        return out ? find<false, true, kNone>(radix) : find<false, false, kNone>(radix);
+    static PassKernel first_pass(int radix, Form in) {
+        if (in == kAcross) return row_kernels(radix).in;
+        return in == kInterleaved ? find<true, false, kInner>(radix) : find<false, false, kInner>(radix);
     }
-    /** `work` holds the transform twice. */
+    static PassKernel last_pass(int radix, Form in, Form out, const Outer& outer) {
+        if (in == kAcross) return row_kernels(radix).across;
+        const bool apart = in == kSplit;
+        if (out == kAcross) return row_kernels(radix).out;
+        if (outer.lanes) return apart ? find<false, true, kLanes>(radix) : find<true, true, kLanes>(radix);
+        if (outer.roots) return apart ? find<false, false, kOuter>(radix) : find<true, false, kOuter>(radix);
+        return apart ? find<false, true, kNone>(radix) : find<true, true, kNone>(radix);
+    }
+    /** `work` holds the transform twice. Backward transforms are forward ones whose results stand in the opposite
+     * order, or the conjugate ones of conjugate rows. */
     static void run(const ShortFft& fft, From in, To out, Outer outer, float* work) {
-        Route route{in.at, in.at, work, in.step, kSlot, outer.roots, outer.lanes};
-        if (fft.backward) {
-            route.in += fft.length * in.step;
-            route.in_step = -in.step;
-        }
-        bool interleaved = in.interleaved;
         const int last = fft.passes - 1;
+        Route route{in.at, work, work, in.step, kSlot, outer};
+        const bool conjugate = fft.backward && out.form == kAcross;
+        if (conjugate) route.sign = -1.0F;
         for (int k = 0; k < last; ++k) {
-            const FftPass& pass = fft.pass[k];
-            (interleaved ? find<true, false, kInner>(pass.radix) : find<false, false, kInner>(pass.radix))(pass,
-                                                                                                           route);
-            interleaved = false;
             float* const next = route.out == work ? work + fft.length * kSlot : work;
-            route = {route.out, route.out, next, kSlot, kSlot, outer.roots, outer.lanes};
+            first_pass(fft.pass[k].radix, k == 0 ? in.form : kSplit)(fft.pass[k], route);
+            route.in = route.out;
+            route.in_step = kSlot;
+            route.out = next;
         }
-        route.out = out.at;
+        route.out = route.zero = out.at;
         route.out_step = out.step;
-        last_pass(fft.pass[last].radix, interleaved, out.interleaved, outer)(fft.pass[last], route);
+        if (fft.backward && !conjugate) {
+            route.out += fft.length * out.step;
+            route.out_step = -out.step;
+        }
+        last_pass(fft.pass[last].radix, last == 0 ? in.form : kSplit, out.form, outer)(fft.pass[last], route);
     }
 
     // --- Transforms down the lanes
@@ -267,9 +292,10 @@ struct LaneFfts {
     /** Rows of an image: too far apart for the processor to see them coming, so that they are asked for early.
      * More of them, a power of two apart, would push each other out of the first caches. */
     static constexpr int kAhead = 6;
+    template <int Nearness = 3>
     QUO_FFT_INLINE void ask(const float* row, std::ptrdiff_t floats) {
         constexpr std::ptrdiff_t kLine = 16;
-        for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(row + k);
+        for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(row + k, 0, Nearness);
     }
     /** The first ones, while there is other work. */
     static void ask_first(const float* row, std::ptrdiff_t step, int rows, std::ptrdiff_t floats) {
@@ -291,46 +317,46 @@ struct LaneFfts {
         }
     }
 
-    /** `packs` packs of columns in two steps. Interleaved slots pass through a stage of `floats` floats a row,
-     * split ones stand `pack_step` apart. */
+    /** `packs` packs of columns in two steps, those that are split one behind the other. Interleaved slots pass
+     * through a stage of `floats` floats a row. */
     static void two_steps(const LaneFft& fft, From in, To out, int packs, std::ptrdiff_t floats,
                           const float* turns, float* room) {
         const int n1 = fft.second.length, n2 = fft.first.length;
+        const std::ptrdiff_t pack = fft.length() * kSlot;
         float *const work = room, *const stage = work + fft.work, *const tile = stage + fft.stage;
         const std::ptrdiff_t stage_step = packs * kSlot, tile_row = packs * fft.pitch * kSlot;
         for (int i = 0; i < n1; ++i) {
-            if (in.interleaved) {
+            if (in.form == kInterleaved) {
                 move(in.at + i * in.step, n1 * in.step, stage, stage_step, n2, floats);
                 if (i + 1 < n1) ask_first(in.at + (i + 1) * in.step, n1 * in.step, n2, floats);
             }
             for (int b = 0; b < packs; ++b) {
-                const From from = in.interleaved ? From{stage + b * kSlot, stage_step, true}
-                                                 : From{in.at + i * in.step, n1 * in.step, false};
-                run(fft.first, from, {tile + (b * fft.pitch + i) * kSlot, tile_row, false},
+                const From from = in.form == kInterleaved
+                                      ? From{stage + b * kSlot, stage_step, kInterleaved}
+                                      : From{in.at + b * pack + i * in.step, n1 * in.step, kSplit};
+                run(fft.first, from, {tile + (b * fft.pitch + i) * kSlot, tile_row, kSplit},
                     {fft.outer + std::ptrdiff_t{i} * n2}, work);
             }
         }
         for (int k = 0; k < n2; ++k) {
-            if (out.interleaved) ask_first(out.at + k * out.step, n2 * out.step, n1, floats);
-            for (int b = 0; b < packs; ++b) {
-                const To to = out.interleaved ? To{stage + b * kSlot, stage_step, true}
-                                              : To{out.at + k * out.step, n2 * out.step, false};
-                run(fft.second, {tile + (k * packs + b) * fft.pitch * kSlot, kSlot, false}, to,
-                    {nullptr, turns ? turns + k * out.step : nullptr}, work);
-            }
-            if (out.interleaved) move(stage, stage_step, out.at + k * out.step, n2 * out.step, n1, floats);
+            ask_first(out.at + k * out.step, n2 * out.step, n1, floats);
+            for (int b = 0; b < packs; ++b)
+                run(fft.second, {tile + (k * packs + b) * fft.pitch * kSlot, kSlot, kSplit},
+                    {stage + b * kSlot, stage_step, kInterleaved},
+                    {nullptr, turns ? turns + b * pack + k * kSlot : nullptr, n2 * kSlot}, work);
+            move(stage, stage_step, out.at + k * out.step, n2 * out.step, n1, floats);
         }
     }
-    /** One whole pack. */
-    static void one_pack(const LaneFft& fft, From in, To out, const float* turns, float* room) {
-        if (fft.two_steps()) return two_steps(fft, in, out, 1, kSlot, turns, room);
+    /** Whole packs: more than one in two steps only. */
+    static void whole_packs(const LaneFft& fft, From in, To out, int packs, const float* turns, float* room) {
+        if (fft.two_steps()) return two_steps(fft, in, out, packs, packs * kSlot, turns, room);
         run(fft.first, in, out, {nullptr, turns}, room);
     }
     /** Columns that fill no pack. */
     static void part_pack(const LaneFft& fft, From in, To out, std::ptrdiff_t floats, float* room) {
         float* const stage = room + fft.work;
         move(in.at, in.step, stage, kSlot, fft.first.length, floats);
-        run(fft.first, {stage, kSlot, true}, {stage, kSlot, true}, {}, room);
+        run(fft.first, {stage, kSlot, kInterleaved}, {stage, kSlot, kInterleaved}, {}, room);
         move(stage, kSlot, out.at, out.step, fft.first.length, floats);
     }
 
@@ -338,13 +364,13 @@ struct LaneFfts {
         const int width = fft.two_steps() ? kStripPacks * W : W;
         for (int c = 0; c < columns.count; c += width) {
             const int some = columns.count - c < width ? columns.count - c : width;
-            const From in{columns.in + 2 * std::ptrdiff_t{c}, columns.step, true};
-            const To out{columns.out + 2 * std::ptrdiff_t{c}, columns.step, true};
+            const From in{columns.in + 2 * std::ptrdiff_t{c}, columns.step, kInterleaved};
+            const To out{columns.out + 2 * std::ptrdiff_t{c}, columns.step, kInterleaved};
             const std::ptrdiff_t floats = 2 * std::ptrdiff_t{some};
             if (fft.two_steps())
                 two_steps(fft, in, out, (some + W - 1) / W, floats, nullptr, room);
             else if (some == W)
-                one_pack(fft, in, out, nullptr, room);
+                whole_packs(fft, in, out, 1, nullptr, room);
             else
                 part_pack(fft, in, out, floats, room);
         }
@@ -398,45 +424,61 @@ struct LaneFfts {
     /** First of a pack's lanes: the last pack overlaps the one before it. */
     QUO_FFT_INLINE int lane_of(int pack, int count) { return (pack + 1) * W <= count ? pack * W : count - W; }
 
-    /** W results of each transform of step 1 become the lanes of step 2. */
-    template <bool ByPack>
-    static void turn_pack(const RowFft& fft, const float* tile, int result, float* lanes) {
-        const int n1 = fft.second.length(), n2 = fft.first.length();
-        for (int b = 0; b * W < n1; ++b) {
-            const float* const slots = tile + (b * fft.pitch + result) * kSlot;
-            const FftRoot* const turns = fft.packs + std::ptrdiff_t{b} * n2 + result;
-            float* const to = lanes + lane_of(b, n1) * kSlot;
-            for (int k = 0; k < W; k += 4) {
-                V re[4], im[4];
-                each<4>([&](auto i) QUO_FFT_HERE {
-                    C c = load<false>(slots + (k + i) * kSlot);
-                    if constexpr (ByPack) c = turn(c, turns[k + i]);
-                    re[i] = c.re;
-                    im[i] = c.im;
-                });
-                save_fours(re, to + k, kSlot);
-                save_fours(im, to + k + W, kSlot);
-            }
+    /** Packs that are moved together from the one that begins at `lane`. */
+    QUO_FFT_INLINE int strip_of(const LaneFft& fft, int lane, int count) {
+        return fft.two_steps() && lane + kStripPacks * W <= count ? kStripPacks : 1;
+    }
+    /** What the results of some packs are turned by, in `room` if they are not kept. */
+    static const float* turns_of(const RowFft& fft, int pack, int packs, float* room) {
+        const int n2 = fft.first.length();
+        const std::ptrdiff_t at = std::ptrdiff_t{pack} * n2;
+        if (!fft.packs) return fft.turns + at * kSlot;
+        for (int k = 0; k < packs * n2; ++k)
+            save<false>(turn(load<false>(fft.turns + k % n2 * kSlot), fft.packs[at + k]), room + k * kSlot);
+        return room;
+    }
+    /** Step 1: what it leaves is a row of the tile for each of its results. The `next` row is asked for on the
+     * way, into the second cache: all at once it would keep what this one needs waiting. */
+    static void across_samples(const RowFft& fft, const float* in, const float* next, float* tile, float* room) {
+        constexpr std::ptrdiff_t kMostAsked = 1 << 15;
+        const int n1 = fft.second.length();
+        const std::ptrdiff_t share = fft.first.length() * kSlot;
+        for (int b = 0, packs = 0; b * W < n1; b += packs) {
+            const int lane = lane_of(b, n1);
+            packs = strip_of(fft.first, lane, n1);
+            if (b * share < kMostAsked) ask<2>(next + b * share, packs * share);
+            whole_packs(fft.first, {in + 2 * lane, 2 * std::ptrdiff_t{n1}, kInterleaved},
+                        {tile + 2 * lane, fft.pitch, kInterleaved}, packs, turns_of(fft, b, packs, room),
+                        room + fft.lanes);
         }
     }
-
-    static void rows(const RowFft& fft, const FftRows& rows, float* room) noexcept {
+    /** Step 2: W rows of the tile are the lanes. */
+    static void across_results(const RowFft& fft, const float* tile, float* out, float* room) {
         const int n1 = fft.second.length(), n2 = fft.first.length();
-        float *const tile = room, *const lanes = tile + fft.tile, *const rest = lanes + fft.lanes;
+        const std::ptrdiff_t step = 2 * std::ptrdiff_t{n2};
+        if (!fft.second.two_steps() && fft.second.first.passes == 1)
+            return run(fft.second.first, {tile, fft.pitch, kAcross}, {out, step, kInterleaved}, {}, room);
+        float *const lanes = room, *const rest = room + fft.lanes;
+        for (int c = 0, packs = 0; c * W < n2; c += packs) {
+            const int result = lane_of(c, n2);
+            packs = strip_of(fft.second, result, n2);
+            From from{tile + result * fft.pitch, fft.pitch, kAcross};
+            if (fft.second.two_steps()) {
+                for (int b = 0; b < packs; ++b, from.at += W * from.step) {
+                    float* const to = lanes + b * std::ptrdiff_t{n1} * kSlot;
+                    row_kernels(1).in({1, n1, 1, nullptr}, {from.at, to, to, from.step});
+                }
+                from = {lanes, kSlot, kSplit};
+            }
+            whole_packs(fft.second, from, {out + 2 * result, step, kInterleaved}, packs, nullptr, rest);
+        }
+    }
+    static void rows(const RowFft& fft, const FftRows& rows, float* room) noexcept {
+        float* const rest = room + fft.tile;
         for (std::ptrdiff_t row = 0; row < rows.count; ++row) {
             const float* const in = rows.in + row * rows.distance;
-            float* const out = rows.out + row * rows.distance;
-            for (int b = 0; b * W < n1; ++b)
-                one_pack(fft.first, {in + 2 * lane_of(b, n1), 2 * std::ptrdiff_t{n1}, true},
-                         {tile + b * fft.pitch * kSlot, kSlot, false},
-                         fft.turns + (fft.packs ? 0 : std::ptrdiff_t{b} * n2 * kSlot), rest);
-            for (int c = 0; c * W < n2; ++c) {
-                const int result = lane_of(c, n2);
-                (fft.packs ? turn_pack<true> : turn_pack<false>)(fft, tile, result, lanes);
-                one_pack(fft.second, {lanes, kSlot, false}, {out + 2 * result, 2 * std::ptrdiff_t{n2}, true},
-                         nullptr, rest);
-                if (row + 1 < rows.count) ask(in + rows.distance + c * kSlot * n1, kSlot * n1);
-            }
+            across_samples(fft, in, row + 1 < rows.count ? in + rows.distance : in, room, rest);
+            across_results(fft, room, rows.out + row * rows.distance, rest);
         }
     }
 
@@ -463,6 +505,14 @@ struct LaneFfts {
     /** First of two neighbours: at an odd end the last two overlap those before. */
     static constexpr int pair_of(int i, int count) { return i + 2 > count ? count - 2 : i; }
 
+    /** W rows. */
+    template <int N>
+    QUO_FFT_INLINE void load_rows(const float* from, const Gap& gap, C (&x)[N]) {
+        each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
+            constexpr int at = pair_of(2 * i, N);
+            load_two(from + 2 * at, gap, x[at], x[at + 1]);
+        });
+    }
     /** `packs` times W rows whose samples registers hold. */
     template <int N>
     static void tiny_rows(const float* in, float* out, const Gap& gap, int packs) {
@@ -473,10 +523,7 @@ struct LaneFfts {
                 });
             } else {
                 C x[N];
-                each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
-                    constexpr int at = pair_of(2 * i, N);
-                    load_two(in + 2 * at, gap, x[at], x[at + 1]);
-                });
+                load_rows(in, gap, x);
                 butterfly<N>(x);
                 each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
                     constexpr int at = pair_of(2 * i, N);
@@ -485,16 +532,33 @@ struct LaneFfts {
             }
         }
     }
+    /** Rows whose samples registers hold become slots: so many that their slots lie side by side. */
+    template <int N>
+    static void pass_across(const FftPass& /*pass*/, const Route& route) {
+        const auto rows = static_cast<int>((route.out_step < 0 ? -route.out_step : route.out_step) / 2);
+        for (int c = 0; c * W < rows; ++c) {
+            const int row = lane_of(c, rows);
+            C x[N];
+            load_rows(route.in + row * route.in_step, {route.in_step, 1.0F}, x);
+            butterfly<N>(x);
+            save<true>(x[0], route.zero + 2 * row);
+            each<N - 1>([&](auto k) QUO_FFT_HERE {
+                save<true>(x[k + 1], route.out + 2 * row + (k + 1) * route.out_step);
+            });
+        }
+    }
     /** The first pass over W rows, which become slots. */
     template <int R>
-    static void pass_in(const FftPass& pass, const float* in, float* out, const Gap& gap) {
+    static void pass_in(const FftPass& pass, const Route& route) {
+        const Gap gap{route.in_step, route.sign};
         for (int p = 0; p < pass.count; p += 2) {
             const int at = pair_of(p, pass.count);
             C x[2][R];
-            each<R>([&](auto j) QUO_FFT_HERE { load_two(in + 2 * (at + j * pass.count), gap, x[0][j], x[1][j]); });
+            each<R>([&](auto j)
+                        QUO_FFT_HERE { load_two(route.in + 2 * (at + j * pass.count), gap, x[0][j], x[1][j]); });
             each<2>([&](auto i) QUO_FFT_HERE {
                 const FftRoot* const roots = pass.roots + (at + i) * (R - 1);
-                float* const to = out + (at + i) * R * kSlot;
+                float* const to = route.out + (at + i) * R * kSlot;
                 butterfly<R>(x[i]);
                 save<false>(x[i][0], to);
                 each<R - 1>([&](auto k)
@@ -504,43 +568,48 @@ struct LaneFfts {
     }
     /** The last pass, whose slots become rows. */
     template <int R>
-    static void pass_out(const FftPass& pass, const float* in, float* out, const Gap& gap) {
+    static void pass_out(const FftPass& pass, const Route& route) {
+        const Gap gap{route.out_step, route.sign};
         for (int q = 0; q < pass.stride; q += 2) {
             const int at = pair_of(q, pass.stride);
             C x[2][R];
             each<2>([&](auto i) QUO_FFT_HERE {
-                each<R>([&](auto j)
-                            QUO_FFT_HERE { x[i][j] = load<false>(in + (at + i + j * pass.stride) * kSlot); });
+                each<R>([&](auto j) QUO_FFT_HERE {
+                    x[i][j] = load<false>(route.in + (at + i + j * pass.stride) * kSlot);
+                });
                 butterfly<R>(x[i]);
             });
             each<R>([&](auto k)
-                        QUO_FFT_HERE { save_two(x[0][k], x[1][k], out + 2 * (at + k * pass.stride), gap); });
+                        QUO_FFT_HERE { save_two(x[0][k], x[1][k], route.out + 2 * (at + k * pass.stride), gap); });
         }
     }
+    /** Rows that are transformed across have a sample for every lane at least. */
+    template <int R>
+    static constexpr PassKernel across_of() {
+        if constexpr (R >= W) return pass_across<R>;
+        return nullptr;
+    }
     struct RowKernels {
-        void (*tiny)(const float*, float*, const Gap&, int);
-        void (*in)(const FftPass&, const float*, float*, const Gap&);
-        void (*out)(const FftPass&, const float*, float*, const Gap&);
+        void (*tiny)(const float*, float*, const Gap&, int) = nullptr;
+        PassKernel in = nullptr, out = nullptr, across = nullptr;
     };
     template <int... R>
-    static constexpr std::array<RowKernels, kRadices> row_kernels(std::integer_sequence<int, R...> /*radices*/) {
+    static constexpr std::array<RowKernels, kRadices> row_table(std::integer_sequence<int, R...> /*radices*/) {
         std::array<RowKernels, kRadices> table{};
-        ((table[R] = {tiny_rows<R>, pass_in<R>, pass_out<R>}), ...);
+        ((table[R].in = pass_in<R>), ...);
+        ((table[R].across = across_of<R>()), ...);
+        if constexpr (kShortRows) ((table[R].tiny = tiny_rows<R>, table[R].out = pass_out<R>), ...);
         return table;
+    }
+    static const RowKernels& row_kernels(int radix) {
+        static constexpr auto kTable = row_table(Radices{});
+        return kTable[static_cast<std::size_t>(radix)];
     }
     /** `packs` times W rows. */
     static void row_packs(const ShortFft& fft, FftRows rows, const Gap& gap, int packs, float* work) {
-        static constexpr auto kKernels = row_kernels(Radices{});
-        const FftPass &first = fft.pass[0], &last = fft.pass[fft.passes - 1];
-        if (fft.passes == 1) return kKernels[first.radix].tiny(rows.in, rows.out, gap, packs);
-        for (; packs > 0; --packs, rows.in += W * gap.step, rows.out += W * gap.step) {
-            float *now = work, *next = work + fft.length * kSlot;
-            kKernels[first.radix].in(first, rows.in, now, gap);
-            for (int k = 1; k < fft.passes - 1; ++k, std::swap(now, next))
-                find<false, false, kInner>(fft.pass[k].radix)(fft.pass[k],
-                                                              {now, now, next, kSlot, kSlot, nullptr, nullptr});
-            kKernels[last.radix].out(last, now, rows.out, gap);
-        }
+        if (fft.passes == 1) return row_kernels(fft.pass[0].radix).tiny(rows.in, rows.out, gap, packs);
+        for (; packs > 0; --packs, rows.in += W * gap.step, rows.out += W * gap.step)
+            run(fft, {rows.in, gap.step, kAcross}, {rows.out, gap.step, kAcross}, {}, work);
     }
     static void short_rows(const LaneFft& fft, const FftRows& rows, float* room) noexcept {
         const std::ptrdiff_t floats = 2 * std::ptrdiff_t{fft.first.length}, step = rows.distance;
@@ -558,7 +627,10 @@ struct LaneFfts {
             std::memcpy(rows.out + (whole + row) * step, stage + row * floats, bytes);
     }
 
-    static constexpr FftKernels kTable{W, columns, rows, short_rows};
+    static constexpr FftKernels kernels() {
+        if constexpr (kShortRows) return {W, columns, rows, short_rows};
+        return {W, columns, rows, nullptr};
+    }
 #undef QUO_FFT_HERE
 #undef QUO_FFT_INLINE
 };

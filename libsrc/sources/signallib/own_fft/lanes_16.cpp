@@ -3,6 +3,6 @@
 namespace quo {
 
 extern const FftKernels kFftKernels16;
-const FftKernels kFftKernels16 = LaneFfts<16>::kTable;
+constexpr FftKernels kFftKernels16 = LaneFfts<16, ProcessorLevel::kAvx512>::kernels();
 
 }  // namespace quo

@@ -3,6 +3,6 @@
 namespace quo {
 
 extern const FftKernels kFftKernels4;
-const FftKernels kFftKernels4 = LaneFfts<4>::kTable;
+constexpr FftKernels kFftKernels4 = LaneFfts<4, ProcessorLevel::kBase>::kernels();
 
 }  // namespace quo

@@ -3,6 +3,6 @@
 namespace quo {
 
 extern const FftKernels kFftKernels8;
-const FftKernels kFftKernels8 = LaneFfts<8>::kTable;
+constexpr FftKernels kFftKernels8 = LaneFfts<8, ProcessorLevel::kAvx2>::kernels();
 
 }  // namespace quo
