@@ -50,7 +50,7 @@ Lines lines_of(const std::string& text) {
 void take_line(std::vector<Case>& cases, const std::string& line, std::size_t number) {
     const std::string rest = line.size() > 2 ? line.substr(2) : "";
     if (line.empty() || line[0] == '#') return;
-    if (line[0] == '=') return cases.push_back({line.substr(3)});
+    if (line[0] == '=') return cases.push_back({line.substr(3), {}});
     auto& steps = cases.at(cases.size() - 1).steps;
     if (line[0] == '$') return steps.push_back({number, rest, 0, {}});
     Step& step = steps.at(steps.size() - 1);
@@ -73,7 +73,7 @@ std::vector<Case> cases_in(const std::string& file) {
 }
 
 std::vector<Case> page_in(const std::string& file) {
-    std::vector<Case> cases{{file, {}, true}};
+    std::vector<Case> cases{{.title = file, .steps = {}, .page = true}};
     auto& steps = cases[0].steps;
     bool block = false, typed = false, continued = false;
     std::size_t number = 0;
