@@ -3,12 +3,12 @@
 # measurement is made, of its size.
 # Usage: scripts/demo_import.sh BUILD_FOLDER
 set -eu
-cd "$(dirname "$0")/.."
+sources=$(dirname "$0")/..
 quo=$1/tools/quo/quo
 folder=demo-output/sentinel1
 rm -rf "$folder"
 mkdir -p "$folder"
-cp -r tests/data/sentinel1/S1A_IW_SLC*.SAFE "$folder"
+cp -r "$sources"/tests/data/sentinel1/S1A_IW_SLC*.SAFE "$folder"
 annotation=$(ls "$folder"/*.SAFE/annotation/*.xml)
 "$1/examples/make_measurement" "$annotation"
 

@@ -1,10 +1,10 @@
 #!/bin/sh
 # The main job: geolocates the bundled real scenes and compares the result with what their producers state.
-# Usage: scripts/demo_job.sh BUILD_FOLDER
+# Usage: scripts/demo_job.sh BUILD_FOLDER; it and its parts write below demo-output in the current folder
 set -eu
-cd "$(dirname "$0")/.."
+sources=$(dirname "$0")/..
 quo=$1/tools/quo/quo
-scenes=tests/data/scenes
+scenes=$sources/tests/data/scenes
 
 echo
 echo "Geolocation of three real scenes against their producers' own points:"
@@ -14,9 +14,9 @@ echo "One sample of the second scene, brought to the ground:"
 printf 'azimuth_time_s,range_time_s\n1133090050.25,0.0058123\n' |
     "$quo" geolocate "$scenes/s1a_iw_grd_20201127_desc_sea.xml" --to ground
 
-scripts/demo_product.sh "$1"
-scripts/demo_import.sh "$1"
-scripts/demo_chain.sh "$1"
-scripts/demo_python.sh "$1"
+"$sources"/scripts/demo_product.sh "$1"
+"$sources"/scripts/demo_import.sh "$1"
+"$sources"/scripts/demo_chain.sh "$1"
+"$sources"/scripts/demo_python.sh "$1"
 echo
-echo "To run quo from any folder: PATH=$PWD/$1/tools/quo:\$PATH"
+echo "To run quo from any folder: PATH=$(cd "$1" && pwd)/tools/quo:\$PATH"

@@ -2,9 +2,9 @@
 # Part of the main job: a complete product, written and read back, and what the tool tells of it.
 # Usage: scripts/demo_product.sh BUILD_FOLDER
 set -eu
-cd "$(dirname "$0")/.."
+sources=$(dirname "$0")/..
 quo=$1/tools/quo/quo
-scene=tests/data/scenes/s1a_iw1_slc_20220104_asc.xml
+scene=$sources/tests/data/scenes/s1a_iw1_slc_20220104_asc.xml
 folder=demo-output/product
 raster=$folder/map_lines.slc
 header=$raster.hdr

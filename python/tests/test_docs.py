@@ -1,4 +1,5 @@
 import re
+from pathlib import Path
 
 import numpy as np
 import pytest
@@ -28,6 +29,17 @@ def make_scene(scene_file):
     return samples
 
 
+def blocks_of(page):
+    return re.findall(r"```python\n(.*?)```", (ROOT / page).read_text(), re.DOTALL)
+
+
+def test_the_page_of_names_is_that_of_the_package(monkeypatch):
+    monkeypatch.syspath_prepend(ROOT / "scripts")
+    import python_names
+
+    assert (ROOT / "docs" / "python_names.md").read_text() == python_names.page()
+
+
 def test_the_examples_of_the_page_run(scene_file, tmp_path, monkeypatch, capsys):
     rasterio = pytest.importorskip("rasterio")
     for module in ("pyproj", "matplotlib", "distributed"):
@@ -35,8 +47,14 @@ def test_the_examples_of_the_page_run(scene_file, tmp_path, monkeypatch, capsys)
     monkeypatch.chdir(tmp_path)
     samples = make_scene(scene_file)
     names: dict = {}
-    for block in re.findall(r"```python\n(.*?)```", (ROOT / "docs" / "python.md").read_text(), re.DOTALL):
+    for block in blocks_of("docs/python.md"):
         exec(block, names)
+    for name in ("scene", "scene.hdr"):
+        Path(name.replace("scene", "cut")).symlink_to(name)  # what the tutorial cuts out
+    shown: dict = {}
+    for block in blocks_of("README.md") + blocks_of("docs/tutorial.md"):
+        exec(block, shown)
+    assert shown["ground"].status.sum() == 0 and shown["scene_map"].image.shape == (300, 300)
     assert np.array_equal(names["block"], samples[100:150, ::2]) and names["seen"].status.sum() == 0
     assert names["scene_map"]["image"].shape == (300, 300) and [each.state for each in names["outcomes"]] == ["made"]
     assert names["power"].shape == (LINES,) and names["fit"].rank == 3 and (tmp_path / "maps.png").stat().st_size > 1e4

@@ -9,9 +9,9 @@
 //   ? status          of the exit, where it is not 0
 //   # text            is for the reader
 //
-// Runs the blocks "```console" of pages of the documentation too: a page is one case. There a line that begins
-// with no
-// "$ " is what the command before it writes, and a command goes on after a backslash.
+// Runs the documentation's pages too, each as one case: the blocks with lines "$ command", which goes on after a
+// backslash. The lines below are what it writes, standard error behind standard output. A status of 1, which
+// findings give, shows by what is said.
 //
 // In an expected line "..." stands for any text, alone on a line for any lines, and 17.3~0.1 for any number that
 // is no further from 17.3 than 0.1.
@@ -37,6 +37,7 @@ struct Step {
 struct Case {
     std::string title;
     std::vector<Step> steps;
+    bool page = false;
 };
 
 Lines lines_of(const std::string& text) {
@@ -72,23 +73,25 @@ std::vector<Case> cases_in(const std::string& file) {
 }
 
 std::vector<Case> page_in(const std::string& file) {
-    std::vector<Case> cases{{file, {}}};
+    std::vector<Case> cases{{.title = file, .steps = {}, .page = true}};
     auto& steps = cases[0].steps;
-    bool console = false, continued = false;
+    bool block = false, typed = false, continued = false;
     std::size_t number = 0;
     for (const std::string& line : lines_of(test::read_text(file))) {
         ++number;
         if (line.starts_with("```")) {
-            console = line == "```console";
-        } else if (console && (continued || line.starts_with("$ "))) {
+            block = !block;
+            typed = false;
+        } else if (block && (continued || line.starts_with("$ "))) {
+            typed = true;
             if (continued) {
                 steps.back().command += "\n" + line;
             } else {
                 steps.push_back({number, line.substr(2), 0, {}});
             }
             continued = line.ends_with('\\');
-        } else if (console) {
-            steps.at(steps.size() - 1).streams['|'].push_back(line);
+        } else if (typed) {
+            steps.back().streams['|'].push_back(line);
         }
     }
     return cases;
@@ -144,9 +147,9 @@ std::string names() {
         return std::filesystem::path{program}.parent_path().string();
     };
     return "PATH='" + folder_of(QUO_TOOL) + "':'" + folder_of(QUO_MAKE_HEADER) + "':'" +
-           folder_of(QUO_PIXEL_PLACE) + R"(':"$PATH")" +
-           "\nscenes='" QUO_TEST_DATA "/scenes' data='" QUO_TEST_DATA "/quo' docs='" QUO_TEST_DATA
-           "/../../docs' sources='" QUO_TEST_DATA "/../..'\n" +
+           folder_of(QUO_PIXEL_PLACE) + "':'" + folder_of(QUO_PROCESSOR) + R"(':"$PATH")" +
+           "\nscenes='" QUO_TEST_DATA "/scenes' data='" QUO_TEST_DATA "/quo' docs='" QUO_DOCS
+           "' sources='" QUO_DOCS "/..' build='" QUO_BUILD "'\n" +
            R"(try() { quo "$@" || echo "[$?]"; })" + "\n";
 }
 
@@ -161,6 +164,11 @@ TEST_P(Transcript, Holds) {
         for (const Step& step : one.steps) {
             SCOPED_TRACE(one.title + ", line " + std::to_string(step.line) + "\n$ " + step.command);
             const test::Finished run = test::Child{"/bin/sh", {"-c", beginning + step.command}}.wait();
+            if (one.page) {
+                EXPECT_TRUE(run.exit_status == 0 || run.exit_status == 1) << run.exit_status;
+                expect_stream(step, '|', run.out + run.err);
+                continue;
+            }
             EXPECT_EQ(run.exit_status, step.status);
             expect_stream(step, '|', run.out);
             expect_stream(step, '!', run.err);
@@ -168,13 +176,37 @@ TEST_P(Transcript, Holds) {
     }
 }
 
-std::vector<std::filesystem::path> files() {
-    const std::filesystem::directory_iterator folder{QUO_CASES};
-    std::vector<std::filesystem::path> all{begin(folder), end(folder)};
-    all.emplace_back(QUO_TEST_DATA "/../../docs/tutorial.md");
+using Files = std::vector<std::filesystem::path>;
+
+Files files_in(const char* path) {
+    const std::filesystem::directory_iterator folder{path};
+    return {begin(folder), end(folder)};
+}
+
+Files pages() {
+    Files all = files_in(QUO_DOCS);
+    std::erase_if(all, [](const auto& file) { return file.extension() != ".md"; });
     return all;
 }
-INSTANTIATE_TEST_SUITE_P(Cases, Transcript, testing::ValuesIn(files()),
-                         [](const auto& file) { return file.param.stem().string(); });
+
+/** None with the sanitizers: pages do jobs of full size, and load the library into programs without them. */
+Files pages_to_run() {
+    if (!QUO_RUN_PAGES) return {};
+    Files all = pages();
+    all.emplace_back(QUO_DOCS "/../README.md");
+    std::erase_if(all, [](const auto& file) { return page_in(file.string())[0].steps.empty(); });
+    return all;
+}
+
+std::string name(const testing::TestParamInfo<std::filesystem::path>& file) { return file.param.stem().string(); }
+INSTANTIATE_TEST_SUITE_P(Cases, Transcript, testing::ValuesIn(files_in(QUO_CASES)), name);
+INSTANTIATE_TEST_SUITE_P(Pages, Transcript, testing::ValuesIn(pages_to_run()), name);
+
+TEST(Book, ListsItsPages) {
+    const std::string book = test::read_text(QUO_DOCS "/README.md");
+    for (const auto& page : pages())
+        EXPECT_TRUE(page.stem() == "README" || book.find("](" + page.filename().string() + ")") != book.npos)
+            << page;
+}
 
 }  // namespace
