@@ -1,6 +1,7 @@
 #include "missions/sentinel1.h"
 
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 
 #include <cmath>
 #include <cstring>
@@ -567,6 +568,11 @@ TEST(Sentinel1, NamesTheFileThatIsDamaged) {
     test::write_text(slc.measurement(), test::read_text(slc.measurement()).replace(8, 64, 64, '\xff'));
     quo_import_result result{};
     EXPECT_EQ(import_safe(slc.path(), folder.file("scene"), result), 4);
+    fs::rename(slc.measurement(), folder.file("kept"));
+    ASSERT_EQ(mkfifo(slc.measurement().c_str(), 0600), 0);  // nobody ever writes into it
+    quo_import_result waiting{};
+    EXPECT_EQ(import_safe(slc.path(), folder.file("scene"), waiting), 1);
+    EXPECT_EQ(waiting.message, slc.measurement() + ": is no regular file");
     EXPECT_EQ(result.message, slc.measurement() + ": is cut short or damaged at line 0");
     grd.change("<numberOfSamples>26102<", "<numberOfSamples>1<");
     try {

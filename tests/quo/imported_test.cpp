@@ -118,14 +118,14 @@ TEST_P(Imported, HasControlPointsByWhichGdalFindsItsPixels) {
                                  std::uintmax_t{samples} * GetParam().lines * 4);  // a hole, for the most
     ASSERT_EQ(test::quo({"vrt", raster()}).exit_status, 0);
     const std::string table = folder_.file("pixels.csv"), ground = folder_.file("ground.csv");
-    test::write_text(table, "line,sample\n700,5000\n2301,11000\n3702,22000\n");
+    test::write_text(table, "line,sample,azimuth_time_s\n700,5000,1\n2301,11000,1\n3702,22000,1\n");
     const double lines[] = {700.0, bursts ? 2142.0 : 2301.0, bursts ? 3384.0 : 3702.0},
                  columns[] = {5000.0, 11000.0, 22000.0};
     ASSERT_EQ(
         test::quo({"geolocate", header(), "--to", "ground", "--input", table, "--output", ground}).exit_status, 0);
     const std::string found =
         test::Child("/bin/sh",
-                    {"-c", "tail -n +2 '" + ground + "' | awk -F, '{print $7, $6, 0}' | gdaltransform -i -tps '" +
+                    {"-c", "tail -n +2 '" + ground + "' | awk -F, '{print $8, $7, 0}' | gdaltransform -i -tps '" +
                                raster() + ".vrt'"})
             .wait()
             .out;

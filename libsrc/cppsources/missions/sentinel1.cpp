@@ -4,6 +4,7 @@
 #include <array>
 #include <cmath>
 #include <functional>
+#include <numeric>
 #include <set>
 #include <span>
 #include <vector>
@@ -446,7 +447,7 @@ void find_delay(const TiePoints& ties, ImageGrid_Obj& grid) {
         grid.pixelTimes({ties.count(), ties.line.data(), ties.sample.data()}, {line_s.data(), range_s.data()}))
         return;
     constexpr double kShare = 0.5;
-    std::vector<double> references_s;  // of which a few may be wrong: the median does not move for them
+    std::vector<double> references_s;  // of which a few may be wrong, and then far off the median
     for (std::size_t i = 0; i < ties.count(); ++i) {
         const double reference_s = ties.range_s[i] - (ties.azimuth_s[i] - line_s[i]) / kShare;
         if (std::isfinite(reference_s)) references_s.push_back(reference_s);  // else in no burst, or not seen
@@ -455,7 +456,10 @@ void find_delay(const TiePoints& ties, ImageGrid_Obj& grid) {
     const auto middle = references_s.begin() + std::ssize(references_s) / 2;
     std::ranges::nth_element(references_s, middle);
     grid.DelayShare = kShare;
-    grid.DelayReference_s = *middle;
+    const double off_s = grid.LineStep_s / kShare, median_s = *middle;
+    std::erase_if(references_s, [&](double reference_s) { return std::abs(reference_s - median_s) > off_s; });
+    grid.DelayReference_s =
+        std::reduce(references_s.begin(), references_s.end()) / static_cast<double>(references_s.size());
 }
 
 std::vector<MissionVector> stated_vectors(const Annotation& a) {
