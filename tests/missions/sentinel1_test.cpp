@@ -159,7 +159,7 @@ TEST(Sentinel1, TakesTheDelayFromTheMostTiePoints) {
     Safe safe{folder, kSlc};
     const auto whole = described(safe);
     std::string text = test::read_text(safe.annotation());
-    text.replace(text.find("<latitude>", text.find("<geolocationGridPoint>")) + 10, 2, "41");  // for 40 degrees
+    text.replace(text.find("<latitude>", text.find("<geolocationGridPoint>")) + 10, 6, "4.0957");  // a kilometre
     test::write_text(safe.annotation(), text);
     const auto made = described(safe);
     EXPECT_EQ(made->ties.count, 14);
