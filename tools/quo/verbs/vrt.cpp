@@ -115,7 +115,7 @@ public:
         }
         if (MatInv(system.data(), inverse.data(), static_cast<int>(all)) != QUO_OK) return;
         for (std::size_t i = 0; i < all; ++i) {
-            weights_.push_back({0.0, 0.0});
+            weights_.emplace_back(0.0, 0.0);
             for (std::size_t j = 0; j < n; ++j) {
                 weights_[i].first += inverse[i * all + j] * points[j].line;
                 weights_[i].second += inverse[i * all + j] * points[j].sample;
