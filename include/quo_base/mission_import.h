@@ -27,8 +27,10 @@ typedef struct quo_import_request {
 /** How far image grid and orbit are off the tie points that the producer states, pixels: of the place that a tie
  * point has, and metres on the ground: of the pixel that it has. */
 typedef struct quo_tie_points {
-    int32_t count;        /**< tie points; 0 where the annotation has none, and then all is 0 */
-    double rms_line;      /**< root mean square of the lines' differences */
+    int32_t count;   /**< tie points that were compared: of those that the annotation has, but for the ones that no
+                          burst shows or that are more than a pixel off; 0 where there are none, and then all
+                          is 0 */
+    double rms_line; /**< root mean square of the lines' differences */
     double most_line;     /**< the largest of them */
     double rms_sample;    /**< the same of the samples */
     double most_sample;   /**< the largest of them */
@@ -57,7 +59,8 @@ typedef struct quo_import_result {
  *
  * @param[in]  request  what to do
  * @param[out] result   filled in any case
- * @return 0; 1 for a null, a product that is none of the mission's or lacks something, an orbit that does not fit
+ * @return 0; 1 for a null, a product that is none of the mission's, lacks something or
+ * contradicts itself (times of bursts, more than a tenth of the tie points, the pass), an orbit that does not fit
  * or does not see the image, or samples that cannot be linked; 4 for a measurement that is cut short; 5, 7, 9. The
  * reason is in the report too. The antenna pattern follows when raster and header are in place: where it alone
  *         cannot be written, the call says so, and they stay. */

@@ -1,6 +1,7 @@
 #include "missions/sentinel1.h"
 
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 
 #include <cmath>
 #include <cstring>
@@ -149,6 +150,50 @@ TEST(Sentinel1, DoesWithoutTiePointsInNoBurst) {
     const auto made = described(safe);
     EXPECT_EQ(made->ties.count, 10);
     EXPECT_LT(made->ties.most_line, 0.001);
+}
+
+// One wrong tie point of 15 used to move the whole image by its share.
+TEST(Sentinel1, TakesTheDelayFromTheMostTiePoints) {
+    const test::Report report;
+    const test::TemporaryFolder folder;
+    Safe safe{folder, kSlc};
+    const auto whole = described(safe);
+    std::string text = test::read_text(safe.annotation());
+    text.replace(text.find("<latitude>", text.find("<geolocationGridPoint>")) + 10, 6, "4.0957");  // a kilometre
+    test::write_text(safe.annotation(), text);
+    const auto made = described(safe);
+    EXPECT_EQ(made->ties.count, 14);
+    EXPECT_NEAR(made->grid.DelayReference_s, whole->grid.DelayReference_s, 2e-6);
+}
+
+// Times that contradict each other would place the image somewhere else.
+TEST(Sentinel1, RefusesBurstsThatContradictTheImage) {
+    const test::Report report;
+    constexpr struct {
+        const char *from, *to, *message;
+    } kChanges[] = {
+        {"azimuthTime>2022-01-04T17:06:01.027146", "azimuthTime>2022-01-04T17:05:51.027146", "not in order"},
+        {"azimuthTime>2022-01-04T17:06:03.785702", "azimuthTime>2022-01-04T17:07:03.785702",
+         "first and last line"},
+        {"<productLastLineUtcTime>2022-01-04T17:06:06", "<productLastLineUtcTime>2022-01-04T17:06:15",
+         "last line"},
+        {"azimuthTime>2022-01-04T17:06:01.027146", "azimuthTime>2022-01-04T17:06:01.127146",
+         "of 15 tie points are"},
+        {"<polarisation>VV", "<polarisation>XX", "the polarization XX is none"},
+        {"<pass>Ascending", "<pass>Descending", "the pass DESCENDING is not that of the state vectors"},
+        {"<missionId>S1A", "<missionId>S1Z", "the mission S1Z is not Sentinel-1"},
+    };
+    for (const auto& [from, to, message] : kChanges) {
+        const test::TemporaryFolder folder;
+        Safe safe{folder, kSlc};
+        safe.change(from, to);
+        try {
+            (void)described(safe);
+            ADD_FAILURE() << from;
+        } catch (const quo::MissionRefusal& refusal) {
+            EXPECT_NE(std::string{refusal.what()}.find(message), std::string::npos) << refusal.what();
+        }
+    }
 }
 
 // The tie points are of the annotation's own orbit: another one must not change what they tell of the delay.
@@ -397,6 +442,7 @@ TEST_P(Cuts, KeepTheTimesOfTheirPixels) {
     if (!grd) {
         safe.change("<numberOfSamples>22694<", "<numberOfSamples>" + std::to_string(cut.samples) + "<");
         safe.change("<linesPerBurst>1501<", "<linesPerBurst>4<");  // bursts of four lines, seconds apart
+        safe.change_element("productLastLineUtcTime", "2022-01-04T17:06:03.791869");
     }
     Layout layout = kPlain;
     if (grd) layout = kDetected;
@@ -454,6 +500,7 @@ TEST(CommitDerived, RefusesAndLeavesNothing) {
     safe.change("<numberOfLines>4503<", "<numberOfLines>12<");
     safe.change("<numberOfSamples>22694<", "<numberOfSamples>30<");
     safe.change("<linesPerBurst>1501<", "<linesPerBurst>4<");
+    safe.change_element("productLastLineUtcTime", "2022-01-04T17:06:03.791869");
     write_tiff(safe.measurement(), kPlain, 12, 30, true);
     quo_import_result result{};
     ASSERT_EQ(import_safe(safe.path(), folder.file("whole"), result), 0) << result.message;
@@ -521,6 +568,11 @@ TEST(Sentinel1, NamesTheFileThatIsDamaged) {
     test::write_text(slc.measurement(), test::read_text(slc.measurement()).replace(8, 64, 64, '\xff'));
     quo_import_result result{};
     EXPECT_EQ(import_safe(slc.path(), folder.file("scene"), result), 4);
+    fs::rename(slc.measurement(), folder.file("kept"));
+    ASSERT_EQ(mkfifo(slc.measurement().c_str(), 0600), 0);  // nobody ever writes into it
+    quo_import_result waiting{};
+    EXPECT_EQ(import_safe(slc.path(), folder.file("scene"), waiting), 1);
+    EXPECT_EQ(waiting.message, slc.measurement() + ": is no regular file");
     EXPECT_EQ(result.message, slc.measurement() + ": is cut short or damaged at line 0");
     grd.change("<numberOfSamples>26102<", "<numberOfSamples>1<");
     try {

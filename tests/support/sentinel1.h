@@ -121,7 +121,10 @@ public:
     void shrink(bool grd) {
         change(grd ? "<numberOfLines>16705<" : "<numberOfLines>4503<", "<numberOfLines>40<");
         change(grd ? "<numberOfSamples>26102<" : "<numberOfSamples>22694<", "<numberOfSamples>30<");
-        if (!grd) change("burst>", "past>");
+        if (grd) return;
+        change("burst>", "past>");
+        change("<line>1501<", "<line>1342<");  // of an image without bursts
+        change("<line>3002<", "<line>2684<");
     }
 
 private:

@@ -17,6 +17,26 @@ bool TiePoints::find_times(const GeneralSAROrbit& orbit) {
            std::ranges::any_of(azimuth_s, [](double t) { return std::isfinite(t); });
 }
 
+void TiePoints::drop_wrong(const ImageGrid_Obj& grid, const GeneralSAROrbit& orbit, const std::string& source) {
+    TiePoints kept;
+    for (std::size_t i = 0; i < count(); ++i) {
+        const TiePoints one{{line[i]},     {sample[i]},    {latitude[i]}, {longitude[i]},
+                            {height_m[i]}, {azimuth_s[i]}, {range_s[i]}};
+        const quo_tie_points off = one.compare(grid, orbit);
+        if (std::max(std::abs(off.most_line), std::abs(off.most_sample)) > kMost) continue;
+        for (std::vector<double> TiePoints::*const list :
+             {&TiePoints::line, &TiePoints::sample, &TiePoints::latitude, &TiePoints::longitude,
+              &TiePoints::height_m, &TiePoints::azimuth_s, &TiePoints::range_s})
+            (kept.*list).push_back((one.*list)[0]);
+    }
+    const std::size_t dropped = count() - kept.count();
+    if (10 * dropped > count())
+        throw MissionRefusal{QUO_REFUSED, source + ": " + std::to_string(dropped) + " of " +
+                                              std::to_string(count()) +
+                                              " tie points are more than a pixel off the image's times"};
+    *this = std::move(kept);
+}
+
 quo_tie_points TiePoints::compare(const ImageGrid_Obj& grid, const GeneralSAROrbit& orbit) const {
     const std::size_t n = count();
     std::vector<double> first(n), second(n), found(n), pixel_azimuth_s(n), pixel_range_s(n), x(n), y(n), z(n);

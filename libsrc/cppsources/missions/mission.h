@@ -42,6 +42,10 @@ struct TiePoints {
     [[nodiscard]] std::size_t count() const { return line.size(); }
     /** When the orbit sees them; not-a-number for those that it does not see. False where it sees none. */
     bool find_times(const GeneralSAROrbit& orbit);
+    /** Drops those whose line or sample is more than kMost off grid and orbit, whose times they have. Refused, in
+     * the name of `source`, where that is more than a tenth of them: then it is the image that is wrong. */
+    void drop_wrong(const ImageGrid_Obj& grid, const GeneralSAROrbit& orbit, const std::string& source);
+    static constexpr double kMost = 1.0;
     /** How far grid and orbit are off them; their times are the orbit's. */
     [[nodiscard]] quo_tie_points compare(const ImageGrid_Obj& grid, const GeneralSAROrbit& orbit) const;
 };

@@ -49,6 +49,9 @@ MeasurementEntry measurement_entry() {
 
 std::unique_ptr<Measurement> open_measurement(const std::string& file, const MissionProduct& product) {
     char why[256] = "";
+    std::error_code error;
+    if (!fs::is_regular_file(file, error))
+        refuse(QUO_REFUSED, file + ": is no regular file");  // a pipe would wait
     std::unique_ptr<Measurement> measurement{
         measurement_entry()(kMeasurementVersion, file.c_str(), why, sizeof why)};
     errno = 0;

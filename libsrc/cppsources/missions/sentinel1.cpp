@@ -4,6 +4,8 @@
 #include <array>
 #include <cmath>
 #include <functional>
+#include <numeric>
+#include <set>
 #include <span>
 #include <vector>
 
@@ -51,8 +53,9 @@ public:
           mode{header.text("mode")} {
         const std::string type = header.text("productType");
         if (type != "SLC" && type != "GRD") root.refuse("the product type " + type + " is neither SLC nor GRD");
-        if (!header.text("missionId").starts_with("S1"))
-            root.refuse("the mission " + header.text("missionId") + " is not Sentinel-1");
+        const std::string mission = header.text("missionId");
+        if (mission.size() != 3 || !mission.starts_with("S1") || mission[2] < 'A' || mission[2] > 'D')
+            root.refuse("the mission " + mission + " is not Sentinel-1");
         if (lines < 1 || samples < 1 || !(range_rate_hz > 0.0)) root.refuse("the image has no size");
         detected = type == "GRD";
     }
@@ -181,14 +184,18 @@ void describe_processing(const std::string& manifest, DataSetInfo_Obj& info) {
 void set_data_set(const Annotation& a, const MissionFiles& files, GeneralSAR& product) {
     DataSetInfo_Obj& info = product.dataSetInfo;
     const std::string mission = a.header.text("missionId"), polarization = a.header.text("polarisation");
+    if (!std::set<std::string>{"HH", "HV", "VH", "VV"}.contains(polarization))
+        a.header.refuse("the polarization " + polarization + " is none");
+    const std::string pass = upper(a.general.text("productInformation/pass"));
+    if (pass != (product.orbit.isAscending() ? "ASCENDING" : "DESCENDING"))
+        a.general.refuse("the pass " + pass + " is not that of the state vectors");
     put(info.OrbitNumber, std::to_string(a.header.integer("absoluteOrbitNumber")));
     put(info.SenseDate, date_text(a.first_line));
     const auto slash = files.annotation.rfind('/') + 1;
     put(info.SceneID, files.annotation.substr(slash, files.annotation.rfind('.') - slash));
     put(info.Description, "Sentinel-1 " + a.mode + " " + a.header.text("productType"));
-    put(info.OrbitConfiguration, upper(a.general.text("productInformation/pass")));
-    put(info.Polarization,
-        polarization.size() == 2 ? polarization.substr(0, 1) + "/" + polarization.substr(1) : polarization);
+    put(info.OrbitConfiguration, pass);
+    put(info.Polarization, polarization.substr(0, 1) + "/" + polarization.substr(1));
     put(info.Swath, a.swath);
     put(info.SensorName, "SENTINEL-" + mission.substr(1));
     info.SceneHeading = a.general.number("productInformation/platformHeading");
@@ -210,6 +217,17 @@ void set_data_set(const Annotation& a, const MissionFiles& files, GeneralSAR& pr
     product.orbit.setLookSign(1);
     if (!files.manifest.empty()) describe_processing(files.manifest, info);
     product.GSenable(gsDataSetInfo);
+}
+
+/** Bursts follow each other, and the last of their lines is the image's. */
+void require_in_order(const Annotation& a, const ImageGrid_Obj& grid) {
+    const auto& starts = grid.BurstStart_s;
+    if (starts.empty()) return;
+    const double end_s = starts.back() + (grid.LinesPerBurst - 1) * grid.LineStep_s;
+    if (std::ranges::adjacent_find(starts, std::greater_equal{}) != starts.end() ||
+        !(std::abs(starts.front() - grid.FirstLine_s) < grid.LineStep_s) ||
+        !(std::abs(end_s - a.last_line.after(grid.Epoch_s)) < grid.LineStep_s))
+        a.root.refuse("the bursts' times are not in order, or not those of the first and last line");
 }
 
 // --- Where the pixels stand -------------------------------------------------------------------------------------
@@ -246,6 +264,7 @@ void set_grid(const Annotation& a, ImageGrid_Obj& grid) {
     if (!grid.isComplete()) a.root.refuse("line and sample times make no image");
     if (grid.Bursts > 0 && grid.LinesPerBurst * std::int64_t{grid.Bursts} != a.lines)
         a.root.refuse("the bursts' lines are not the image's");
+    require_in_order(a, grid);
 }
 
 /** Range time of the last sample, at the first line. */
@@ -428,16 +447,19 @@ void find_delay(const TiePoints& ties, ImageGrid_Obj& grid) {
         grid.pixelTimes({ties.count(), ties.line.data(), ties.sample.data()}, {line_s.data(), range_s.data()}))
         return;
     constexpr double kShare = 0.5;
-    double sum_s = 0.0;
-    int count = 0;
+    std::vector<double> references_s;  // of which a few may be wrong, and then far off the median
     for (std::size_t i = 0; i < ties.count(); ++i) {
-        if (std::isnan(line_s[i] + ties.azimuth_s[i])) continue;  // in no burst, or not seen
-        sum_s += ties.range_s[i] - (ties.azimuth_s[i] - line_s[i]) / kShare;
-        ++count;
+        const double reference_s = ties.range_s[i] - (ties.azimuth_s[i] - line_s[i]) / kShare;
+        if (std::isfinite(reference_s)) references_s.push_back(reference_s);  // else in no burst, or not seen
     }
-    if (count == 0 || !std::isfinite(sum_s)) return;
+    if (references_s.empty()) return;
+    const auto middle = references_s.begin() + std::ssize(references_s) / 2;
+    std::ranges::nth_element(references_s, middle);
     grid.DelayShare = kShare;
-    grid.DelayReference_s = sum_s / count;
+    const double off_s = grid.LineStep_s / kShare, median_s = *middle;
+    std::erase_if(references_s, [&](double reference_s) { return std::abs(reference_s - median_s) > off_s; });
+    grid.DelayReference_s =
+        std::reduce(references_s.begin(), references_s.end()) / static_cast<double>(references_s.size());
 }
 
 std::vector<MissionVector> stated_vectors(const Annotation& a) {
@@ -464,7 +486,10 @@ void describe_sentinel1(const MissionFiles& files, const std::string& orbit_file
     set_data_set(a, files, header);
     set_grid(a, product.grid);
     TiePoints ties = stated_ties(a);
-    if (ties.find_times(header.orbit)) find_delay(ties, product.grid);
+    if (ties.find_times(header.orbit)) {
+        find_delay(ties, product.grid);
+        ties.drop_wrong(product.grid, header.orbit, files.annotation);
+    }
     // The tie points are of the annotation's own orbit: by another one the delay would take up what that one
     // mends.
     if (!orbit_file.empty())

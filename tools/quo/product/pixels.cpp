@@ -36,6 +36,14 @@ Pixels::Pixels(const std::string& header, GeneralSAR& product) : product_{produc
         throw Failure(header + ": neither a pixel grid (section ImageGrid) nor a region (section ROI)");
 }
 
+void Pixels::drop_bursts(double first_s) {
+    grid_.Bursts = 0;
+    grid_.BurstStart_s.clear();
+    grid_.LinesPerBurst = 0;
+    grid_.FirstLine_s = first_s;
+    grid_.FirstLine = 0.0;
+}
+
 bool Pixels::known(const std::string& header, GeneralSAR& product) {
     ImageGrid_Obj grid;
     return described_raster(product) != nullptr && product.GSexists(gsOrbit) && product.GSexists(gsDataSetInfo) &&

@@ -1,5 +1,6 @@
 #include "product.h"
 
+#include <algorithm>
 #include <cmath>
 
 #include "date.h"
@@ -14,6 +15,21 @@ namespace {
 
 bool is_known(const geopoint& point) {
     return std::abs(point.Latitude) <= 90.0 && std::abs(point.Longitude) <= 360.0;
+}
+
+/** The letters of the swath "IW1" where they are two, as those that name a mode. */
+std::string mode_of(const std::string& swath, const std::string& mode) {
+    const auto letters = std::min(swath.find_first_of("0123456789"), swath.size());
+    return letters == 2 ? swath.substr(0, letters) : mode;
+}
+
+/** The usual name of what the image is, where it has one. */
+std::string type_of(const DataSetInfo_Obj& info, const std::string& otherwise) {
+    if (info.IsImageType(DataSetInfo_Obj::dsAzimuthFocused) && info.IsProjection(DataSetInfo_Obj::dsSlantRange))
+        return "SLC";
+    if (info.IsImageType(DataSetInfo_Obj::dsMultilook) && info.IsProjection(DataSetInfo_Obj::dsGroundRange))
+        return "GRD";
+    return otherwise;
 }
 
 }  // namespace
@@ -74,11 +90,12 @@ Told::Told(const GeneralSAR& product) {
         return product.GSexists(gsDataSetInfo) && is_told(field) ? std::string{field} : std::string{};
     };
     mission = text(info.SensorName);
-    mode = text(info.AcquisitionMode);
     swath = text(info.Swath);
+    mode = mode_of(swath, text(info.AcquisitionMode));
     polarization = text(info.Polarization);
+    std::erase(polarization, '/');
     orbit_number = text(info.OrbitNumber);
-    image_type = text(info.ImageType);
+    image_type = type_of(info, text(info.ImageType));
     scene = text(info.SceneID);
     if (product.GSexists(gsOrbit)) direction = product.orbit.isAscending() ? "ascending" : "descending";
     if (!product.GSexists(gsRoi) || product.roi.Roi.isNULL() != 0) return;

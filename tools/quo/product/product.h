@@ -39,7 +39,10 @@ bool is_told(std::string_view text);
 struct Told {
     explicit Told(const GeneralSAR& product);
 
-    std::string mission, mode, swath, polarization, orbit_number, image_type, scene;
+    std::string mission, swath, orbit_number, scene;
+    std::string mode;          ///< "IW" of the swath "IW1", where swaths are named after their mode, else the header's
+    std::string polarization;  ///< "VV"
+    std::string image_type;    ///< "SLC" or "GRD", or what else the header calls it
     std::string direction;              ///< of the orbit: "ascending", "descending"
     std::string start_time, stop_time;  ///< of the region's first and last line, ISO 8601 in UTC
 };

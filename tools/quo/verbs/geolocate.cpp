@@ -205,7 +205,8 @@ void check_use(const GeolocateOptions& options) {
 /** A table to the ground has times, or where it has none lines and samples. */
 const Direction& direction_of(const GeolocateOptions& options, const Table& table) {
     if (options.direction == "ground") {
-        if (table.find(kAzimuthTime)) return kToGround;
+        const bool pixels = table.find("line") && table.find("sample");
+        if (table.find(kAzimuthTime) && (table.find("range_time_s") || !pixels)) return kToGround;
         if (table.find("line")) return kPixelsToGround;
         throw Failure(table.place_of_names() +
                       ": neither columns azimuth_time_s and range_time_s nor line and sample");

@@ -33,22 +33,6 @@ std::string band_of(double frequency_ghz) {
     return "";
 }
 
-/** "IW" of the swath "IW1", where swaths are named after their mode, else the mode as the header has it. */
-std::string mode_of(const Told& told) {
-    const std::string_view swath = told.swath, letters = swath.substr(0, swath.find_first_of("0123456789"));
-    if (letters.size() == 2) return std::string{letters};
-    return told.mode;
-}
-
-/** The usual name of what the image is, where it has one. */
-std::string type_of(const DataSetInfo_Obj& info, const Told& told) {
-    if (info.IsImageType(DataSetInfo_Obj::dsAzimuthFocused) && info.IsProjection(DataSetInfo_Obj::dsSlantRange))
-        return "SLC";
-    if (info.IsImageType(DataSetInfo_Obj::dsMultilook) && info.IsProjection(DataSetInfo_Obj::dsGroundRange))
-        return "GRD";
-    return told.image_type;
-}
-
 /** A product as an item of a catalogue. */
 class Item {
 public:
@@ -94,17 +78,16 @@ private:
 
     void add_radar(const DataSetInfo_Obj& info) {
         const double frequency_ghz = product_.samplingConstants.fc_hz * 1e-9;
-        std::string polarization = told_.polarization;
-        std::erase(polarization, '/');
+        const std::string& polarization = told_.polarization;
         const bool known = std::set<std::string>{"HH", "VV", "HV", "VH"}.contains(polarization);
         properties_["sar:instrument_mode"] =
-            required(mode_of(told_), "acquisition mode (DataSetInfo/AcquisitionMode)");
+            required(told_.mode, "acquisition mode (DataSetInfo/AcquisitionMode)");
         properties_["sar:frequency_band"] =
             required(band_of(frequency_ghz), "frequency of a radar band (SamplingConstants/fc_hz)");
         properties_["sar:center_frequency"] = frequency_ghz;
         properties_["sar:polarizations"] =
             Json::array({required(known ? polarization : "", "polarization (DataSetInfo/Polarization)")});
-        properties_["sar:product_type"] = required(type_of(info, told_), "image type (DataSetInfo/ImageType)");
+        properties_["sar:product_type"] = required(told_.image_type, "image type (DataSetInfo/ImageType)");
         properties_["sar:observation_direction"] = info.LookDirection < 0 ? "left" : "right";
         if (info.RangeLooks > 0) properties_["sar:looks_range"] = info.RangeLooks;
     }
