@@ -3,14 +3,18 @@
 import os
 import pickle
 import re
+import subprocess
 import sys
+import time
 import tracemalloc
+from functools import partial
 
 import numpy as np
 import pytest
 import quo_base
 from conftest import DATA, SCENES, copy_of_safe, write_model
 from quo_base import Job, Product, geocode, run, sentinel1
+from quo_base import jobs as jobs_module
 
 rasterio = pytest.importorskip("rasterio")
 pyproj = pytest.importorskip("pyproj")
@@ -163,6 +167,11 @@ def _write(path, text, fail_once=None):
         raise OSError("once")
 
 
+def _slowly(path, text):
+    time.sleep(0.01)
+    _write(path, text)
+
+
 def _kill_once(path, mark):
     _write(path, "half")
     if not os.path.exists(mark):
@@ -175,12 +184,43 @@ def test_outputs_appear_whole_or_not_at_all(tmp_path):
     jobs = [Job(str(tmp_path / str(i)), _write, (str(i),)) for i in range(5)]
     jobs.append(Job(str(tmp_path / "again"), _write, ("again", str(tmp_path / "mark"))))
     jobs.append(Job(str(tmp_path / "never"), _write, ()))
+    jobs.append(Job(str(tmp_path / "ends"), sys.exit))
+    jobs.append(Job(str(tmp_path / "nothing"), partial(max, "a")))
     outcomes = run(jobs, progress=None)
-    assert [outcome.state for outcome in outcomes] == ["made"] * 6 + ["failed"] and "TypeError" in outcomes[-1].reason
+    assert [outcome.state for outcome in outcomes] == ["made"] * 6 + ["failed"] * 3
+    for outcome, reason in zip(outcomes[6:], ("TypeError", "SystemExit", "has made nothing")):
+        assert reason in outcome.reason
     assert sorted(os.listdir(tmp_path)) == ["0", "1", "2", "3", "4", "again", "mark"]
     assert [outcome.state for outcome in run(jobs[:6], progress=None)] == ["skipped"] * 6
     with pytest.raises(ValueError):
-        run(jobs[:1] * 2)
+        run([jobs[0], jobs[0]._replace(output=str(tmp_path / "x" / ".." / "0"))])
+
+
+def test_only_what_this_run_or_a_dead_one_has_begun_is_swept(tmp_path):
+    host, mine = jobs_module._host(), f"{os.getpid():08x}"
+    dead = subprocess.Popen(["true"])
+    dead.wait()
+    out = str(tmp_path / "out")
+    stay = [".part-1", ".part-" + "g" * 32, f".part-{host}{mine}{0:016x}", f".part-{'0' * 8}{dead.pid:08x}{0:016x}"]
+    output_too = f".part-{host}{dead.pid:08x}{1:016x}"
+    for tail in (*stay, output_too, f".part-{host}{dead.pid:08x}{0:016x}"):
+        _write(out + tail, "")
+    jobs = [Job(out, _write, ("text",)), Job(out + output_too, _write, ("text",))]
+    assert [outcome.state for outcome in run(jobs, progress=None)] == ["made", "skipped"]
+    assert sorted(os.listdir(tmp_path)) == sorted("out" + tail for tail in ("", output_too, *stay))
+
+
+def test_what_progress_raises_ends_the_run(tmp_path):
+    def stop(*_):
+        raise KeyboardInterrupt
+
+    jobs = [Job(str(tmp_path / str(i)), _slowly, ("",)) for i in range(200)]
+    with pytest.raises(KeyboardInterrupt) as raised:
+        run(jobs, progress=stop)
+    made = os.listdir(tmp_path)
+    assert 0 < len(made) < 200
+    time.sleep(0.1)
+    assert os.listdir(tmp_path) == made and raised.tb  # which holds all that ran
 
 
 def test_a_killed_worker_leaves_nothing_half(tmp_path, product, flat):
