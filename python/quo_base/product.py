@@ -114,7 +114,14 @@ class Section(MutableMapping):
             return NotImplemented
         return list(self) == list(other) and all(_same(self[name], other[name]) for name in self)
 
+    def __reduce__(self) -> tuple:
+        root = self._name.split("/")[0]
+        names = [name for name in self._header.sections() if name.split("/")[0] == root]
+        return _restored_section, (self._name, {name: dict(Section(self._header, name)) for name in names})
+
     def __repr__(self) -> str:
+        if self._header.record(self._name) is None:
+            return f"<Section {self._name}, which is there no more>"
         width = max((len(name) for name in self), default=0)
         rows = [
             f"  {name:{width}}  {_shown(value)} {self.describe(name).unit}".rstrip()
@@ -124,6 +131,24 @@ class Section(MutableMapping):
 
     def _repr_html_(self) -> str:
         return _html({self._name: self})
+
+
+def _restored_section(name: str, content: dict[str, dict[str, Any]]) -> Section:
+    return Section(_header_of(content), name)
+
+
+def _header_of(content: dict[str, dict[str, Any]]) -> _core.Header:
+    product = Product()
+    for section, fields in content.items():
+        product.add(section, **fields)
+    return product._header
+
+
+class _Closed:
+    """Stands for the header of a closed product."""
+
+    def __getattr__(self, name: str) -> Any:
+        raise ValueError("the product is closed")
 
 
 def _html(sections: Mapping[str, Section]) -> str:
@@ -281,6 +306,8 @@ class Product(Mapping):
                 yield f"{name}/{field}", value
 
     def __repr__(self) -> str:
+        if isinstance(self._header, _Closed):
+            return f"<Product {self._path or 'in memory'}, closed>"
         rows = [f"  {name}: {len(section)} fields" for name, section in self.items()]
         return "\n".join([f"<Product {self._path or 'in memory'}>", *rows])
 
@@ -304,6 +331,17 @@ class Product(Mapping):
         if self._path is None:
             self._set("_path", target)
 
+    def close(self) -> None:
+        """Gives the header up: all further use of the product is refused. Sections, orbits, grids and rasters that
+        it gave stay."""
+        self._set("_header", _Closed())
+
+    def __enter__(self) -> Product:
+        return self
+
+    def __exit__(self, *_: object) -> None:
+        self.close()
+
     def clone(self) -> Product:
         """A copy that can be changed apart from this one."""
         copy = Product.__new__(Product)
@@ -312,7 +350,8 @@ class Product(Mapping):
         return copy
 
     def __reduce__(self) -> tuple:
-        return _restored, (self._path, self._raster, {name: dict(section) for name, section in self.items()})
+        content = {name: dict(section) for name, section in self.items()}
+        return _restored, (self._path, self._raster, content, self._header.grid_broken)
 
     # --- Geometry and samples ------------------------------------------------------------------------------------
 
@@ -323,7 +362,8 @@ class Product(Mapping):
 
     @property
     def grid(self) -> Grid:
-        """Where pixels stand in time: the section "ImageGrid", else the region that the file told."""
+        """Where pixels stand in time: the section "ImageGrid", else the region "ROI" where that has the raster's
+        size, as they are now."""
         return Grid(self._header.grid())
 
     @property
@@ -331,6 +371,7 @@ class Product(Mapping):
         """The product's raster, which is read slice by slice."""
         if self._path is None:
             raise ValueError("a product in memory has no raster")
+        self._header.sections()  # refused once the product is closed
         return Raster(self._raster, header=self._path)
 
     def evaluate(self, quantity: str, range_time: Any, azimuth_time: Any, interpolate: bool = False) -> Any:
@@ -341,13 +382,14 @@ class Product(Mapping):
         around the azimuth time; else the one at or after it.
         """
         arrays = broadcast(range_time, to_seconds(azimuth_time))
-        return self._header.evaluate(quantity, interpolate, *arrays)[()]
+        return self._header.evaluate(str(quantity), bool(interpolate), *arrays)[()]
 
 
-def _restored(path: Optional[str], raster: Optional[str], content: dict[str, dict[str, Any]]) -> Product:
+def _restored(
+    path: Optional[str], raster: Optional[str], content: dict[str, dict[str, Any]], grid_broken: bool
+) -> Product:
     product = Product()
-    for section, fields in content.items():
-        product.add(section, **fields)
-    product._set("_path", path)
-    product._set("_raster", raster)
+    for name, value in (("_header", _header_of(content)), ("_path", path), ("_raster", raster)):
+        product._set(name, value)
+    product._header.grid_broken = grid_broken
     return product
