@@ -7,7 +7,7 @@ from typing import Any, NamedTuple, Optional, Sequence
 import numpy as np
 
 from . import _core
-from ._arrays import broadcast, contiguous, doubles, plain
+from ._arrays import broadcast, contiguous, doubles, plain, whole_number
 from .times import to_seconds
 
 __all__ = ["Finding", "Geometry", "Ground", "Orbit", "Sighting"]
@@ -102,7 +102,13 @@ class Orbit:
         to the ground.
         """
         held = [contiguous(doubles(each)) for each in (positions, velocities)]
-        self._orbit = _core.Orbit(float(to_seconds(first_time)), spacing, held[0], held[1], wavelength, look)
+        self._orbit = _core.Orbit(
+            float(to_seconds(first_time)),
+            float(spacing),
+            *held,
+            None if wavelength is None else float(wavelength),
+            None if look is None else whole_number(look),
+        )
 
     @classmethod
     def _of(cls, orbit: _core.Orbit) -> Orbit:
@@ -178,7 +184,7 @@ class Orbit:
 
     def resample(self, spacing: float) -> Orbit:
         """The orbit with vectors at most `spacing` seconds apart, as precise as its own vectors allow."""
-        return Orbit._of(self._orbit.resampled(spacing))
+        return Orbit._of(self._orbit.resampled(float(spacing)))
 
     def check(self) -> list[Finding]:
         """What is wrong with the vectors: gaps, duplicates, steps, velocities that are not the derivative."""
