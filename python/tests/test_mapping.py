@@ -77,6 +77,8 @@ def test_a_ridge_hides_and_overlays_what_its_geometry_says(product, tmp_path):
     heights = np.repeat(np.maximum(0.0, 300.0 - 3.0 * x)[np.newaxis], 40, axis=0)
     path = write_model(tmp_path / "ridge.tif", heights, (east - 1000, north + 200), 10.0, crs)
     made = geocode(product, path, quantities=["mask", "incidence"], heights="ellipsoid")
+    tiles = geocode(product, path, quantities=["mask"], heights="ellipsoid", chunks=16).compute()
+    np.testing.assert_array_equal(tiles["mask"], made["mask"])  # what lies outside a tile is seen from it
     row = made["mask"].values[20]
     angle = np.radians(float(made.incidence[20, 100]))
     x, y, z = product.orbit.velocity(times.azimuth_time)
@@ -98,7 +100,7 @@ def test_heights_of_a_geoid_are_converted_or_refused_and_never_mixed(product, fl
     with pytest.raises(ValueError, match="no place in common"):
         far = write_model(tmp_path / "far.tif", np.zeros((9, 9)), (150.0, 10.0), 1e-3)
         geocode(product, far, heights="ellipsoid")
-    for wrong in ({"resampling": "cubic"}, {"quantities": []}, {"quantities": ["height", "slope"]}, {"heights": "sea"}, {"spacing": -1.0}, {"chunks": 0}):
+    for wrong in ({"spacing": 1e-9}, {"spacing": 1e9}, {"crs": "EPSG:4978"}, {"resampling": "cubic"}, {"quantities": []}, {"quantities": ["height", "slope"]}, {"heights": "sea"}, {"spacing": -1.0}, {"chunks": 0}):
         with pytest.raises(ValueError):
             geocode(product, flat, **{"heights": "ellipsoid", **wrong})
     with pytest.MonkeyPatch.context() as absent, pytest.raises(ModuleNotFoundError, match="python3-pyproj"):
@@ -108,6 +110,49 @@ def test_heights_of_a_geoid_are_converted_or_refused_and_never_mixed(product, fl
         file.transform = rasterio.Affine(1e-4, 2e-5, file.transform.c, 2e-5, -1e-4, file.transform.f)
     with pytest.raises(ValueError, match="along the axes"):
         geocode(product, flat, heights="ellipsoid")
+
+
+def test_heights_are_what_their_file_means(product, flat, tmp_path):
+    with rasterio.open(flat, "r+") as file:
+        file.write(np.full((60, 400), 50, "f4"), 1)
+        file.scales, file.offsets = (2.0,), (5.0,)
+        mask = np.full((60, 400), 255, "u1")
+        mask[30, 200] = 0
+        file.write_mask(mask)
+    made = geocode(product, flat, heights="ellipsoid", quantities=["height", "mask"])
+    assert np.isnan(made.height[30, 200]) and made["mask"][30, 200] == 4 and not made["mask"][:, :100].any()
+    np.testing.assert_allclose(made.height[:, :100], 105.0, rtol=1e-12)
+    solid = write_model(tmp_path / "solid.tif", np.zeros((60, 400)), rasterio.open(flat).transform[2:6:3], 1e-4, "EPSG:4979")
+    assert not geocode(product, solid, quantities=["height"]).height.any()
+    with pytest.raises(ValueError, match="ellipsoid"):
+        geocode(product, solid, heights="egm96")
+    with rasterio.open(flat, "r+") as file:
+        file.units = ("foot",)
+    with pytest.raises(ValueError, match="metres"):
+        geocode(product, flat, heights="ellipsoid")
+
+
+@pytest.mark.parametrize("width, turn", [(400, 0.0), (400, 360.0), (3600, 0.0)])
+def test_a_map_goes_on_beyond_the_antimeridian(product, flat, tmp_path, width, turn):
+    """Turned about the Earth's axis, image and model are the same elsewhere."""
+    whole = geocode(product, flat, heights="ellipsoid")
+    a, _, west, _, _, north = rasterio.open(flat).transform[:6]
+    delta = 180.0 - west - 200.5 * a
+    turned, c, s = product.clone(), np.cos(np.radians(delta)), np.sin(np.radians(delta))
+    vectors, matrix = product.orbit, np.array([[c, -s, 0], [s, c, 0], [0, 0, 1]])
+    turned.orbit = quo_base.Orbit(vectors.first_time, vectors.spacing, vectors.positions @ matrix.T, vectors.velocities @ matrix.T)
+    turned.save(tmp_path / "turned.hdr", exact=True)
+    turned = Product(tmp_path / "turned.hdr", raster=product.path[:-4])
+    if width == 400:
+        path = write_model(tmp_path / "there.tif", np.zeros((60, 400)), (west + delta - turn, north), a)
+        made = geocode(turned, path, heights="ellipsoid")
+        np.testing.assert_allclose(made.image, whole.image, atol=1e-4)
+    else:
+        path = write_model(tmp_path / "round.tif", np.zeros((1800, 3600)), (-180.0, 90.0), 0.1)
+        made = geocode(turned, path, spacing=a, heights="ellipsoid", chunks=400)
+        x, y = whole.x.values + delta, whole.y.values
+        near = made.image.sel(x=x[5:-5], y=y[5:-5], method="nearest")
+        assert made.x.size < 4000 and np.isfinite(near).all()
 
 
 def test_tie_points_of_a_real_ground_range_image_lie_on_their_pixels(tmp_path):
@@ -140,11 +185,22 @@ def test_memory_is_that_of_a_tile_not_of_the_map(product, flat):
     assert peak(50) < 0.4 * peak(400)
 
 
-def test_files_and_clusters_that_go_are_told(product, flat, tmp_path):
+def test_files_and_clusters_that_go_are_told(product, flat, tmp_path, monkeypatch):
     copy = str(tmp_path / "copy.hdr")
     Product(product.path).save(copy)
     tiles = geocode(Product(copy, raster=product.path[:-4]), flat, heights="ellipsoid", chunks=64)
     assert tiles.image.mean().compute(scheduler="synchronous") == pytest.approx(1, abs=0.5)
+    changed = Product(copy, raster=product.path[:-4])
+    monkeypatch.chdir(tmp_path)
+    there = geocode(changed, "flat.tif", heights="ellipsoid", chunks="auto").image  # names without a folder
+    assert there.data.npartitions == 1 and there.data.name != tiles.image.data.name
+    monkeypatch.chdir("/")
+    np.testing.assert_array_equal(there.compute(scheduler="synchronous"), tiles.image.compute(scheduler="synchronous"))
+    os.utime(flat, (1, 1))  # a model that has changed makes other tiles
+    assert geocode(changed, flat, heights="ellipsoid", chunks=64).image.data.name != tiles.image.data.name
+    changed.SamplingConstants.prf_hz *= 1.001
+    with pytest.raises(ValueError, match="save"):
+        geocode(changed, flat, heights="ellipsoid")
     os.remove(flat)
     with pytest.raises(rasterio.errors.RasterioIOError, match="flat.tif"):
         tiles.compute(scheduler="synchronous")
@@ -178,6 +234,13 @@ def _kill_once(path, mark):
         open(mark, "w").close()
         os._exit(1)
     _write(path, "whole")
+
+
+def _kill_once_within(tile, mark):
+    if not os.path.exists(mark):
+        open(mark, "w").close()
+        os._exit(1)
+    return tile
 
 
 def test_outputs_appear_whole_or_not_at_all(tmp_path):
@@ -231,7 +294,9 @@ def test_a_killed_worker_leaves_nothing_half(tmp_path, product, flat):
     with distributed.LocalCluster(n_workers=2, threads_per_worker=1, dashboard_address=None) as cluster:
         with distributed.Client(cluster) as client:
             assert all(outcome.state != "failed" for outcome in run(jobs, client, progress=None))
-            tiles = geocode(product, flat, heights="ellipsoid", chunks=100).image.compute()
-    assert (tmp_path / "killed").read_text() == "whole"
+            tiles = geocode(product, flat, heights="ellipsoid", chunks=100).image
+            mark = str(tmp_path / "again")
+            tiles = tiles.data.map_blocks(_kill_once_within, mark, dtype=tiles.dtype, meta=np.empty((0, 0), "f4")).compute()
+    assert os.path.exists(mark) and (tmp_path / "killed").read_text() == "whole"
     assert not [name for name in os.listdir(tmp_path) if ".part-" in name]
-    np.testing.assert_array_equal(tiles.values, whole)
+    np.testing.assert_array_equal(tiles, whole)
