@@ -155,6 +155,29 @@ def test_a_map_goes_on_beyond_the_antimeridian(product, flat, tmp_path, width, t
         assert made.x.size < 4000 and np.isfinite(near).all()
 
 
+def check_real_terrain(product):
+    """A map over measured heights: against the array calls at heights taken pixel by pixel, and against
+    the one tie point that lies there, from which its terrain differs by metres."""
+    path = DATA / "sentinel1" / "dem" / "rome_30m.tif"
+    made = geocode(product, path, quantities=["line", "sample", "height"])
+    with rasterio.open(path) as file:
+        row, column = np.random.default_rng(2).integers(0, 120, (2, 50))
+        longitude, latitude = (np.array(each) for each in file.xy(row, column))
+        above_sea = file.read(1)[row, column].astype(float)
+    geoid = pyproj.Transformer.from_crs("EPSG:4326+5773", "EPSG:4979", always_xy=True)
+    height = geoid.transform(longitude, latitude, above_sea)[2]
+    seen = product.orbit.to_radar(latitude, longitude, height)
+    there = product.grid.pixels(*seen[:2])
+    assert made.height.shape == (120, 120) and np.ptp(height) > 20
+    for name, expected, most in (("height", height, 1e-4), ("line", there.line, 1e-3), ("sample", there.sample, 1e-3)):
+        np.testing.assert_allclose(made[name].values[row, column], expected, rtol=0, atol=most)
+    line, sample, latitude, longitude, height, incidence = 8020, 22202, 42.00620382, 12.49345628, 93.9934, 44.0716
+    here = made.interp(x=longitude, y=latitude)
+    nearer = (float(here.height) - height) / np.tan(np.radians(incidence)) / 10.0  # samples of 10 m
+    assert abs(float(here.height) - height) < 15
+    assert (float(here["line"]), float(here["sample"]) + nearer) == pytest.approx((line, sample), abs=0.1)
+
+
 def test_tie_points_of_a_real_ground_range_image_lie_on_their_pixels(tmp_path):
     """On slopes that go through each tie point's height: what its producer states, from the whole chain of the map."""
     name = "S1B_IW_GRDH_1SDV_20211223T051122_20211223T051147_030148_039993_5371.SAFE"
@@ -162,6 +185,7 @@ def test_tie_points_of_a_real_ground_range_image_lie_on_their_pixels(tmp_path):
     product = sentinel1.import_product(folder, tmp_path / "image").product
     product.RasterInfo.NrOfPixelsPerLine = 26102  # no samples are read
     product.save(exact=True)
+    check_real_terrain(product)
     tags = ("line", "pixel", "latitude", "longitude", "height")
     stated = np.array([re.findall(f"<{tag}>([0-9.e+-]+)</{tag}>", annotation)[-20:] for tag in tags], float).T
     slope = np.add.outer(np.arange(-4, 5), 2 * np.arange(-4, 5))
