@@ -10,7 +10,7 @@ import numpy as np
 
 from . import _core
 from ._arrays import broadcast, plain
-from ._paths import file_name
+from ._paths import absolute, file_name
 from .orbit import Orbit
 from .raster import Raster
 from .times import to_seconds
@@ -351,7 +351,8 @@ class Product(Mapping):
 
     def __reduce__(self) -> tuple:
         content = {name: dict(section) for name, section in self.items()}
-        return _restored, (self._path, self._raster, content, self._header.grid_broken)
+        path, raster = (name and absolute(name) for name in (self._path, self._raster))
+        return _restored, (path, raster, content, self._header.grid_broken)
 
     # --- Geometry and samples ------------------------------------------------------------------------------------
 

@@ -12,7 +12,7 @@ import numpy as np
 
 from . import _core
 from ._arrays import contiguous, whole_number
-from ._paths import file_name
+from ._paths import absolute, file_name
 from .errors import from_failure
 
 __all__ = ["Raster", "RasterWriter"]
@@ -170,7 +170,7 @@ class Raster:
         self.close()
 
     def __reduce__(self) -> tuple:
-        return _reopened, (self._path, self._header, self._wanted)
+        return _reopened, (self._path and absolute(self._path), absolute(self._header), self._wanted)
 
     def __repr__(self) -> str:
         if self._opened is None:

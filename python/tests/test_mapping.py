@@ -214,8 +214,8 @@ def test_files_and_clusters_that_go_are_told(product, flat, tmp_path, monkeypatc
     Product(product.path).save(copy)
     tiles = geocode(Product(copy, raster=product.path[:-4]), flat, heights="ellipsoid", chunks=64)
     assert tiles.image.mean().compute(scheduler="synchronous") == pytest.approx(1, abs=0.5)
-    changed = Product(copy, raster=product.path[:-4])
     monkeypatch.chdir(tmp_path)
+    changed = Product("copy.hdr", raster=product.path[:-4])
     there = geocode(changed, "flat.tif", heights="ellipsoid", chunks="auto").image  # names without a folder
     assert there.data.npartitions == 1 and there.data.name != tiles.image.data.name
     monkeypatch.chdir("/")

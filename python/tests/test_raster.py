@@ -66,10 +66,14 @@ def test_written_blocks_are_converted(tmp_path):
         assert not out.any()
 
 
-def test_nothing_is_read_before_it_is_asked_for(tmp_path):
+def test_nothing_is_read_before_it_is_asked_for(tmp_path, monkeypatch):
     samples = made(tmp_path)
     os.truncate(tmp_path / "image", samples.nbytes - 1)
-    raster = Product(tmp_path / "image.hdr").raster
+    monkeypatch.chdir(tmp_path)
+    product = pickle.loads(pickle.dumps(Product("image.hdr")))  # to other folders, too
+    raster = pickle.loads(pickle.dumps(Raster("image")))
+    assert (product.path, raster.path) == (str(tmp_path / "image.hdr"), str(tmp_path / "image"))
+    raster = product.raster
     assert np.array_equal(raster[:8], samples[:8])
     with pytest.raises(FileError) as caught:
         raster[8]
