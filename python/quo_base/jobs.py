@@ -12,7 +12,7 @@ import time
 import uuid
 from contextlib import closing
 from concurrent.futures import Executor, Future, ThreadPoolExecutor, as_completed
-from typing import Any, Callable, Iterable, Iterator, NamedTuple, Optional
+from typing import Any, Callable, Generator, Iterable, NamedTuple, Optional
 
 __all__ = ["Job", "Outcome", "run"]
 
@@ -108,7 +108,7 @@ def _tried(job: Job, tries: int, run: str) -> Outcome:
     raise ValueError("a job is tried once at least")
 
 
-def _in_threads(jobs: list[Job], tries: int, run: str) -> Iterator[Outcome]:
+def _in_threads(jobs: list[Job], tries: int, run: str) -> Generator[Outcome, None, None]:
     pool: Executor
     with ThreadPoolExecutor() as pool:
         futures: list[Future[Outcome]] = [pool.submit(_tried, job, tries, run) for job in jobs]
@@ -120,7 +120,7 @@ def _in_threads(jobs: list[Job], tries: int, run: str) -> Iterator[Outcome]:
                 future.cancel()
 
 
-def _on_cluster(client: Any, jobs: list[Job], tries: int, run: str) -> Iterator[Outcome]:
+def _on_cluster(client: Any, jobs: list[Job], tries: int, run: str) -> Generator[Outcome, None, None]:
     """Jobs of workers that are lost go to others; one that loses several workers has failed."""
     from distributed import as_completed as completed
 

@@ -170,7 +170,7 @@ def geocode(
     names = (absolute(held.path), absolute(held.raster.path))
     files = tuple(map(_stamp, (*names, terrain.path)))
     job = _Job(*names, terrain, grid, resampling, tuple(quantities), relief, files)
-    return _dataset(job, _eager(job) if chunks is None else _lazy(job, _TILE if chunks == "auto" else chunks))
+    return _dataset(job, _eager(job) if chunks is None else _lazy(job, chunks if isinstance(chunks, int) else _TILE))
 
 
 def _stamp(name: str) -> tuple[int, int]:
@@ -253,7 +253,7 @@ def _lazy(job: _Job, size: int) -> dict[str, Any]:
     for name in job.quantities:
         key = f"{name}-{token}"
         layer = {(key, i, j): (operator.getitem, (f"tile-{token}", i, j), name) for i, j in places}
-        layers = {f"tile-{token}": tiles, key: layer}
+        layers: dict[str, Any] = {f"tile-{token}": tiles, key: layer}
         graph = HighLevelGraph(layers, {f"tile-{token}": set(), key: {f"tile-{token}"}})
         made[name] = da.Array(graph, key, chunks, dtype=_dtype(name))
     return made

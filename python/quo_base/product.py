@@ -196,13 +196,20 @@ class Grid:
     def __init__(self, grid: _core.Grid) -> None:
         self._grid = grid
 
-    bursts = property(lambda self: self._grid.bursts, doc="Number of bursts; 0 for an image without.")
-    ground_range = property(
-        lambda self: self._grid.ground_range, doc="Whether samples are equally spaced on the ground."
-    )
-    lines_at_one_time = property(
-        lambda self: self._grid.lines_at_one_time, doc="Whether all samples of a line have one azimuth time."
-    )
+    @property
+    def bursts(self) -> int:
+        """Number of bursts; 0 for an image without."""
+        return self._grid.bursts
+
+    @property
+    def ground_range(self) -> bool:
+        """Whether samples are equally spaced on the ground."""
+        return self._grid.ground_range
+
+    @property
+    def lines_at_one_time(self) -> bool:
+        """Whether all samples of a line have one azimuth time."""
+        return self._grid.lines_at_one_time
 
     def times(self, line: Any, sample: Any) -> PixelTimes:
         """Times of pixels; whole numbers are the centres of pixels."""
@@ -270,12 +277,9 @@ class Product(Mapping):
         raise AttributeError(f"the product has no {name}")
 
     def __setattr__(self, name: str, value: Any) -> None:
-        if name == "orbit":
-            if not isinstance(value, Orbit):
-                raise TypeError("an Orbit is needed")
-            self._header.set_orbit(value._orbit)
-        else:
+        if name != "orbit":
             raise AttributeError(f"{name} cannot be set; sections are added by add()")
+        object.__setattr__(self, name, value)
 
     def __dir__(self) -> list[str]:
         return [*super().__dir__(), *(name for name in self if "/" not in name)]
@@ -316,7 +320,10 @@ class Product(Mapping):
 
     # --- Files and copies ----------------------------------------------------------------------------------------
 
-    path = property(lambda self: self._path, doc="Name of the header file; None for a product in memory.")
+    @property
+    def path(self) -> Optional[str]:
+        """Name of the header file; None for a product in memory."""
+        return self._path
 
     def save(self, path: Optional[Path] = None, exact: bool = False) -> None:
         """Writes the header: into its own file, or another, whose other sections stay.
@@ -360,6 +367,12 @@ class Product(Mapping):
     def orbit(self) -> Orbit:
         """The orbit through the product's state vectors, with its wavelength and look side, as they are now."""
         return Orbit._of(self._header.orbit())
+
+    @orbit.setter
+    def orbit(self, value: Orbit) -> None:
+        if not isinstance(value, Orbit):
+            raise TypeError("an Orbit is needed")
+        self._header.set_orbit(value._orbit)
 
     @property
     def grid(self) -> Grid:

@@ -177,8 +177,16 @@ class Raster:
             return f"<Raster: {self.path}>"
         return f"<Raster: {self.path}, {self.shape[0]} lines of {self.shape[1]} samples, {self.dtype}>"
 
-    path = property(lambda self: self._path or self._header[:-4], doc="Name of the raster file.")
-    shape = property(lambda self: (self._reader.lines, self._reader.samples), doc="Lines and samples of a line.")
+    @property
+    def path(self) -> str:
+        """Name of the raster file."""
+        return self._path or self._header[:-4]
+
+    @property
+    def shape(self) -> tuple[int, int]:
+        """Lines and samples of a line."""
+        return (self._reader.lines, self._reader.samples)
+
     ndim = 2
 
     @property

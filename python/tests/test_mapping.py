@@ -220,6 +220,7 @@ def test_files_and_clusters_that_go_are_told(product, flat, tmp_path, monkeypatc
     assert there.data.npartitions == 1 and there.data.name != tiles.image.data.name
     monkeypatch.chdir("/")
     np.testing.assert_array_equal(there.compute(scheduler="synchronous"), tiles.image.compute(scheduler="synchronous"))
+    monkeypatch.chdir(tmp_path)
     os.utime(flat, (1, 1))  # a model that has changed makes other tiles
     assert geocode(changed, flat, heights="ellipsoid", chunks=64).image.data.name != tiles.image.data.name
     changed.SamplingConstants.prf_hz *= 1.001
