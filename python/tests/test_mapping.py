@@ -22,9 +22,13 @@ pytest.importorskip("xarray")
 LINES, SAMPLES = 600, 2000
 
 
+def stripes(latitude, longitude):
+    return 1.0 + 0.5 * np.cos(2 * np.pi * 120 * latitude) + 0.5 * np.cos(2 * np.pi * 150 * longitude)
+
+
 @pytest.fixture(scope="module")
 def product(tmp_path_factory):
-    """A part of a real scene whose amplitudes are large near whole minutes of latitude."""
+    """A part of a real scene whose amplitudes are large near half minutes of latitude and near some of longitude."""
     path = str(tmp_path_factory.mktemp("map") / "image")
     scene = Product(DATA / "scenes" / (SCENES[0] + ".xml"))
     made = scene.clone()
@@ -34,7 +38,7 @@ def product(tmp_path_factory):
     line, sample = np.meshgrid(np.arange(LINES), np.arange(SAMPLES), indexing="ij")
     seen = made.orbit.to_ground(1167930362.0 + 2.0555e-3 * line, 0.0055 + 1.5541e-8 * sample)
     with quo_base.RasterWriter(path, (LINES, SAMPLES), np.float32) as writer:
-        writer[:] = 1.0 + np.cos(2 * np.pi * 120 * seen.latitude)
+        writer[:] = stripes(seen.latitude, seen.longitude)
     made.save(path + ".hdr", exact=True)
     return Product(path + ".hdr")
 
@@ -49,11 +53,10 @@ def flat(product, tmp_path):
 
 
 @pytest.mark.parametrize("resampling, most", [("nearest", 0.15), ("bilinear", 0.02), ("sinc", 0.003)])
-def test_what_depends_on_latitude_alone_is_the_same_along_every_row(product, flat, resampling, most):
+def test_stripes_of_latitude_and_longitude_are_where_they_belong(product, flat, resampling, most):
     made = geocode(product, flat, resampling=resampling, heights="ellipsoid")
-    expected = 1.0 + np.cos(2 * np.pi * 120 * made.y.values)
     assert made.image.shape == (60, 400)
-    assert np.nanmax(np.abs(made.image.values - expected[:, np.newaxis])) < most
+    assert np.nanmax(np.abs(made.image.values - stripes(made.y.values[:, np.newaxis], made.x.values))) < most
 
 
 def test_tiles_are_the_whole_on_any_scheduler_and_travel_small(product, flat):
