@@ -77,6 +77,8 @@ class Region(_Model):
 
     def __and__(self, other: Region) -> Region:
         """What two regions share, on this one's grid; refused where that is nothing."""
+        if not isinstance(other, Region):
+            return NotImplemented
         shared = Region._of(self._header.intersect(other._header))
         if shared.Lines < 1 or shared.Samples < 1:
             raise ValueError("the regions have nothing in common")
@@ -89,6 +91,12 @@ class Region(_Model):
     def lines(self, azimuth_time: Any) -> Any:
         """Indices of the lines nearest to azimuth times."""
         return self._header.lines(_known(to_seconds(azimuth_time)))[()]
+
+
+def _headers(*regions: Region) -> list[Any]:
+    if not all(isinstance(each, Region) for each in regions):
+        raise TypeError("a Region is needed")
+    return [each._header for each in regions]
 
 
 class Polynomial(_Model):
@@ -141,11 +149,11 @@ class Coregistration(_Model):
 
     def with_samples(self, master: Region, slave: Region) -> Coregistration:
         """The mapping whose sample form is made of its time form."""
-        return Coregistration._of(self._header.with_samples(master._header, slave._header))
+        return Coregistration._of(self._header.with_samples(*_headers(master, slave)))
 
     def with_times(self, master: Region, slave: Region) -> Coregistration:
         """The mapping whose time form is made of its sample form."""
-        return Coregistration._of(self._header.with_times(master._header, slave._header))
+        return Coregistration._of(self._header.with_times(*_headers(master, slave)))
 
 
 class Configuration(Section):

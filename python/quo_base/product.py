@@ -70,7 +70,7 @@ class Section(MutableMapping):
         return self._record.get(name)
 
     def __setitem__(self, name: str, value: Any) -> None:
-        self._record.update({name: value})
+        self.update({name: value})
 
     def __delitem__(self, name: str) -> None:
         raise TypeError("fields of a header object stay")
@@ -103,7 +103,10 @@ class Section(MutableMapping):
 
     def update(self, *values: Any, **fields: Any) -> None:
         """Sets several fields in one step, all or none; lengths of arrays together with the arrays."""
-        self._record.update(dict(*values, **fields))
+        named = dict(*values, **fields)
+        if not all(isinstance(name, str) for name in named):
+            raise TypeError("fields are named by texts")
+        self._record.update(named)
 
     def describe(self, name: str) -> Field:
         """Unit, meaning and bounds of a field."""

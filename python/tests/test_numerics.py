@@ -44,6 +44,23 @@ def test_certified_fits_are_met():
 
 
 @pytest.mark.parametrize(
+    "doing",
+    [
+        lambda: Region()[3],
+        lambda: Configuration(3),
+        lambda: Region().update({1: 2}),
+        lambda: Region.read("x", 3),
+        lambda: ParameterFile("x")["a", 1],
+        lambda: Coregistration().with_samples(1, 2),
+    ],
+)
+def test_wrong_types_are_told_in_the_words_of_the_package(doing):
+    with pytest.raises(TypeError) as caught:
+        doing()
+    assert "_core" not in str(caught.value) and "self:" not in str(caught.value)
+
+
+@pytest.mark.parametrize(
     "refused, doing",
     [
         (Refused, lambda: signal.fft(np.zeros((0, 4)))),
