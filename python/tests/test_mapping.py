@@ -66,6 +66,11 @@ def test_tiles_are_the_whole_on_any_scheduler_and_travel_small(product, flat):
     for name, values in tiles.compute(scheduler="threads").items():
         np.testing.assert_array_equal(values, whole[name])
     assert not whole["mask"].any()
+    with rasterio.open(flat, "r+") as file:
+        file.write(200 * np.random.default_rng(4).random((60, 400), "f4"), 1)
+    rough = [geocode(product, flat, chunks=chunks, **wanted).compute(scheduler="threads") for chunks in (None, 25)]
+    for name in wanted["quantities"]:
+        np.testing.assert_array_equal(*(each[name] for each in rough), err_msg=name)
     inner = (slice(2, -2), slice(2, -2))  # on flat ground the terrain's normal is the ellipsoid's
     np.testing.assert_allclose(whole.local_incidence[inner], whole.incidence[inner], atol=0.02)
 
