@@ -17,6 +17,7 @@ _HEIGHTS = {"ellipsoid": None, "egm96": "EPSG:4326+5773", "egm2008": "EPSG:4326+
 _SINC = 8  # samples each way
 _METRES = ("m", "metre", "metres", "meter", "meters")
 _REACH_DEG = 0.25  # 27 km, over which the highest mountain of the Earth hides or overlays what lies at the sea
+_GEOID_M = 50.0  # by which a geoid changes over that way, and more
 _MOST_PIXELS = 2**20  # of a model or map at a time
 _FINEST, _COARSEST = 1 / 50, 10  # of the image's finest pixel, and of what it may reach
 
@@ -124,7 +125,7 @@ class Terrain(NamedTuple):
                 block = self._read(file, row, min(strip, last - row), left, right - left)
                 known = block[np.isfinite(block)]
                 low, high = min(low, known.min(initial=np.inf)), max(high, known.max(initial=-np.inf))
-        return max(high - low, 0.0)
+        return max(high - low, 0.0) + (0.0 if self.geoid is None else _GEOID_M)
 
     def _pixels(self, longitude: np.ndarray, latitude: np.ndarray) -> tuple[np.ndarray, np.ndarray]:
         """Rows and columns of places; centres of pixels have whole numbers."""
@@ -158,7 +159,7 @@ def _geoid_of(path: Any, crs: Any, heights: Optional[str]) -> Optional[str]:
     whole = CRS.from_wkt(crs.to_wkt())
     if not whole.is_compound and len(whole.axis_info) == 3:
         if heights not in (None, "ellipsoid") or whole.axis_info[2].unit_name != "metre":
-            raise ValueError(f"{path}: its heights stand on the ellipsoid of {whole.name}, not on {heights!r} in metres")
+            raise ValueError(f"{path}: its heights are above the ellipsoid of {whole.name}, in {whole.axis_info[2].unit_name}")
         return None
     vertical = [part.to_authority() for part in whole.sub_crs_list if part.is_vertical]
     named = "+".join(["EPSG:4326", vertical[0][1]]) if vertical and vertical[0] else None
@@ -404,7 +405,12 @@ LAYOVER, SHADOW, UNKNOWN = 1, 2, 4
 
 
 def layover_and_shadow(
-    heights: Callable[[int, int], np.ndarray], here: np.ndarray, tangent: np.ndarray, steps: Any, pixel_m: float, relief: float
+    heights: Callable[[int, int], np.ndarray],
+    here: np.ndarray,
+    tangent: np.ndarray,
+    steps: Any,
+    pixel_m: float,
+    relief: float,
 ) -> np.ndarray:
     """LAYOVER where another place along the line of sight's plane has the same range, SHADOW where one hides this
     one, UNKNOWN where height or sight are.

@@ -146,14 +146,14 @@ def geocode(
 ) -> Any:
     """The product's image as a map: an xarray.Dataset with one variable for each quantity.
 
-    product: as its file has it, so that what was changed is saved before. dem: elevation model, any file that
-    rasterio reads. heights: what its heights stand on, "ellipsoid" (WGS84), "egm96" or "egm2008"; unless told, what
+    product: as its file has it; one with changes that are not saved is refused. dem: elevation model, any file that
+    rasterio reads, in metres once its scale is applied. heights: what its heights stand on, "ellipsoid" (WGS84), "egm96" or "egm2008"; unless told, what
     the file names, and one that names nothing is refused. Geoid heights are converted by pyproj, or refused where
     its grids are missing. crs and spacing (in units of crs): the map's reference system and pixels; unless given
-    those of the elevation model.
+    those of the elevation model. What is far finer than the image's pixels or coarser than all of it is refused.
     The map covers the model as far as the image may reach. resampling: "nearest", "bilinear" or "sinc" (eight
-    samples each way). quantities: see QUANTITIES. chunks: pixels of a tile's side, or "auto"; then the variables are dask
-    arrays of tiles that are made when they are asked for, on any scheduler. Not-a-number where there is no image.
+    samples each way). quantities: see QUANTITIES. chunks: pixels of a tile's side, or "auto"; then the variables are
+    dask arrays of tiles that are made when they are asked for, on any scheduler. Not-a-number where there is no image.
 
     Amplitudes of complex images are interpolated, not the samples: their phase turns too fast for a neighbour's.
     """
