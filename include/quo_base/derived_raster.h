@@ -34,6 +34,10 @@ QUO_BASE_API const RasterDescription* described_raster(const GeneralSAR& product
  * @return 0; 1 where there is neither; 4 for a section that makes no grid, which no region may stand for; 7 */
 QUO_BASE_API int read_image_grid(const char* header, const GeneralSAR& product, ImageGrid_Obj& grid) noexcept;
 
+/** The grid of the product's region alone, as read_image_grid() makes it where the header lists none. 0; 1 where
+ * there is no region, or none of the raster's size; 7. `grid` is changed in any case. */
+QUO_BASE_API int region_image_grid(const GeneralSAR& product, ImageGrid_Obj& grid) noexcept;
+
 /** Completes a raster that BufferFile::create() started, as BufferFile::commit() does, with the whole header of
  * the raster that it came of.
  *

@@ -358,6 +358,13 @@ public:
      * exactly one of the two forms, for arrays that overlap or that no memory can hold. Nothing is written then.
      */
     int earth2sat(const OrbitTargets& targets, const OrbitSightings& seen) const noexcept;
+    /** Where the platform is at times: positions, m, and velocities, m/s, the derivative of the position
+     * polynomial; x, y and z of each time in turn, null where they are not wanted, three not-a-numbers for a time
+     * that is not finite.
+     * @return 0; 1 without a model, for missing times, for arrays that overlap at all or that no memory can hold.
+     * Nothing is written then. */
+    int SVGetStates(std::size_t count, const double* times_s, double* positions_m,
+                    double* velocities_m_s) const noexcept;
 
     // --- geometry of a sample --------------------------------------------------------------------
     //

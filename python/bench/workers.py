@@ -7,34 +7,52 @@ import pickle
 import resource
 import tempfile
 import time
+from contextlib import ExitStack
+from statistics import median
 
 from distributed import Client, LocalCluster
 from quo_base import geocode
 from scene import make_product, make_terrain, seconds
 
-LINES, SAMPLES, PIXELS, TILE = 4000, 4000, 768, 128
+LINES, SAMPLES, PIXELS, TILE, TURNS = 4000, 4000, 768, 128, 7
 
 
 def peak_mib():
     return resource.getrusage(resource.RUSAGE_SELF).ru_maxrss / 1024
 
 
-def on_workers(count, first, doing):
-    """Seconds of a run, after one that loads the modules; the processor's seconds of the busiest worker; and the
-    workers' memory before and after, MiB."""
+def start(stack, count, first):
+    """A client of so many workers, each of which has made a tile, so that the modules are loaded."""
     alone = {"threads_per_worker": 1, "dashboard_address": ":0"}
-    with LocalCluster(n_workers=count, **alone) as cluster, Client(cluster) as client:
-        client.run(first)
-        before, busy = max(client.run(peak_mib).values()), client.run(time.process_time)
-        took = seconds(doing)
-        spent = [now - busy[worker] for worker, now in client.run(time.process_time).items()]
-        print("processor's seconds of each worker:", *(f"{each:.2f}" for each in spent))
-        most = max(spent)
-        return took, most, before, max(client.run(peak_mib).values())
+    cluster = stack.enter_context(LocalCluster(n_workers=count, **alone))
+    client = stack.enter_context(Client(cluster, set_as_default=False))
+    client.run(first)
+    return client
+
+
+def measured(client, wanted):
+    """Seconds of a run by the clock, and the processor's seconds of the busiest worker."""
+    busy = client.run(time.process_time)
+    took = seconds(lambda: client.compute(wanted).result())
+    return took, max(now - busy[worker] for worker, now in client.run(time.process_time).items())
+
+
+def compare(one, two, whole):
+    """One and two workers in turns, so that both see the same load; how many times as fast two are."""
+    ratios = []
+    for turn in range(TURNS):
+        clients = (one, two) if turn % 2 == 0 else (two, one)
+        found = {client: measured(client, whole) for client in clients}
+        ratios.append([alone / shared for alone, shared in zip(found[one], found[two])])
+        print("one worker: {:.2f} s, busy {:.2f} s;".format(*found[one]), end=" ")
+        print("two: {:.2f} s, the busier {:.2f} s".format(*found[two]), flush=True)
+    clock, busy = zip(*ratios)
+    print(f"two workers beside one, median of {TURNS} turns: {median(clock):.2f} times as fast by the clock,"
+          f" {median(busy):.2f} times by the processor's time of the busier")
 
 
 def main():
-    with tempfile.TemporaryDirectory() as folder:
+    with tempfile.TemporaryDirectory() as folder, ExitStack() as stack:
         header = make_product(folder, LINES, SAMPLES)
         dem = make_terrain(folder, header, PIXELS)
 
@@ -42,22 +60,19 @@ def main():
             return geocode(header, dem, heights="ellipsoid", chunks=size, resampling=resampling).image
 
         whole, small = tiles(TILE), tiles(16, "bilinear")[:256, :256]
-        count = whole.data.npartitions
 
         def first():
             small[:16, :16].compute(scheduler="synchronous")
 
-        one = None
-        for workers in (1, 2):
-            took, most, before, after = on_workers(workers, first, lambda: whole.mean().compute())
-            one = one or (took, most)
-            print(f"{workers} worker(s): {count} tiles of {TILE} x {TILE} in {took:.2f} s,"
-                  f" {one[0] / took:.2f} times as fast as one; processor's time of the busiest {most:.2f} s, one: {one[1] / most:.2f} times;"
-                  f" {before:.0f} MiB before, {after:.0f} MiB after", flush=True)
-        start = time.process_time()
+        one, two = (start(stack, count, first) for count in (1, 2))
+        before = max(one.run(peak_mib).values())
+        print(f"{whole.data.npartitions} tiles of {TILE} x {TILE}")
+        compare(one, two, whole.mean())
+        print(f"memory of a worker: {before:.0f} MiB before, {max(one.run(peak_mib).values()):.0f} MiB after")
+        begun = time.process_time()
         small.compute(scheduler="synchronous")
-        inside = time.process_time() - start
-        _, on_one, _, _ = on_workers(1, first, lambda: small.compute())
+        inside = time.process_time() - begun
+        _, on_one = measured(one, small)
         print(f"a tile of 16 x 16, bilinear, processor's time: {1e3 * inside / 256:.2f} ms;"
               f" on a worker {1e3 * on_one / 256:.2f} ms")
         for plan in (whole.data, tiles(16).data):

@@ -1,6 +1,7 @@
 """Radar products: headers, orbits and geolocation, rasters, polynomials, signal processing and time."""
 
-from . import errors, sentinel1, signal, times
+from ._calls import hide_signatures
+from . import errors, mapping, models, sentinel1, signal, times
 from .errors import Error, FileError, NumericError, OutOfMemory, Refused
 from .jobs import Job, Outcome, run
 from .mapping import geocode
@@ -9,6 +10,8 @@ from .parameters import ParameterFile
 from .models import Configuration, Coregistration, Polynomial, Region
 from .product import Product
 from .raster import Raster, RasterWriter
+
+hide_signatures()
 
 __all__ = [
     "Configuration",
@@ -29,6 +32,8 @@ __all__ = [
     "Region",
     "errors",
     "geocode",
+    "mapping",
+    "models",
     "run",
     "sentinel1",
     "signal",

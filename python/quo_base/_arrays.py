@@ -2,6 +2,7 @@
 
 from __future__ import annotations
 
+import operator
 from collections.abc import Iterable
 from typing import Any
 
@@ -28,6 +29,14 @@ def broadcast(*values: Any) -> list[Any]:
     arrays = [None if value is None else doubles(value) for value in values]
     shape = np.broadcast_shapes(*(array.shape for array in arrays if array is not None))
     return [None if array is None else contiguous(np.broadcast_to(array, shape)) for array in arrays]
+
+
+def whole_number(value: Any) -> int:
+    """An integer as the library counts."""
+    number = operator.index(value)
+    if not -(2**31) <= number < 2**31:
+        raise ValueError(f"{number} does not fit into 32 bits")
+    return number
 
 
 def plain(arrays: Iterable[Any]) -> list[Any]:

@@ -4,16 +4,22 @@ from __future__ import annotations
 
 import os
 from functools import lru_cache
-from typing import Any, NamedTuple, Optional
+from typing import Any, Callable, NamedTuple, Optional
 
 import numpy as np
 
 from . import _core
 from ._arrays import broadcast
+from ._paths import absolute
 
 RESAMPLINGS = ("nearest", "bilinear", "sinc")
 _HEIGHTS = {"ellipsoid": None, "egm96": "EPSG:4326+5773", "egm2008": "EPSG:4326+3855"}
 _SINC = 8  # samples each way
+_METRES = ("m", "metre", "metres", "meter", "meters")
+_REACH_DEG = 0.25  # 27 km, over which the highest mountain of the Earth hides or overlays what lies at the sea
+_GEOID_M = 50.0  # by which a geoid changes over that way, and more
+_MOST_PIXELS = 2**20  # of a model or map at a time
+_FINEST, _COARSEST = 1 / 50, 10  # of the image's finest pixel, and of what it may reach
 
 
 def _horizontal(crs: Any) -> str:
@@ -21,7 +27,22 @@ def _horizontal(crs: Any) -> str:
     from pyproj import CRS
 
     whole = CRS.from_user_input(crs)
-    return (whole.sub_crs_list[0] if whole.is_compound else whole).to_wkt()
+    flat = whole.sub_crs_list[0] if whole.is_compound else whole
+    if not (flat.is_geographic or flat.is_projected):
+        raise ValueError(f"{whole.name} is neither geographic nor projected: no map")
+    return flat.to_wkt()
+
+
+@lru_cache(16)
+def _in_degrees(crs: str) -> bool:
+    from pyproj import CRS
+
+    return CRS.from_wkt(crs).is_geographic
+
+
+def _around(longitude: Any, middle: Any) -> Any:
+    """Longitudes, degrees, within half a turn of a middle, so that what lies beyond 180 stays beside it."""
+    return longitude + 360.0 * np.round((middle - longitude) / 360.0)
 
 
 @lru_cache(16)  # making one takes longer than what a small tile asks of it; pyproj keeps them apart for threads
@@ -50,7 +71,7 @@ class Terrain(NamedTuple):
     crs: str
     transform: tuple[float, ...]
     shape: tuple[int, int]
-    nodata: Optional[float]
+    scale: tuple[float, float]
     geoid: Optional[str]
 
     @classmethod
@@ -65,8 +86,11 @@ class Terrain(NamedTuple):
             geoid = _geoid_of(path, file.crs, heights)
             if file.transform.b or file.transform.d:
                 raise ValueError(f"{path}: its rows do not run along the axes; warp it first")
+            if (file.units[0] or "m").lower() not in _METRES:
+                raise ValueError(f"{path}: its heights are in {file.units[0]}, not in metres")
             crs, transform = _horizontal(file.crs.to_wkt()), tuple(file.transform)[:6]
-            made = cls(os.fspath(path), crs, transform, file.shape, file.nodata, geoid)
+            scale = (file.scales[0], file.offsets[0])
+            made = cls(absolute(os.fspath(path)), crs, transform, file.shape, scale, geoid)
         if geoid is not None:
             _to_ellipsoid(geoid)
         return made
@@ -74,23 +98,58 @@ class Terrain(NamedTuple):
     def heights(self, longitude: np.ndarray, latitude: np.ndarray) -> np.ndarray:
         """Heights above the ellipsoid at places, bilinear; not-a-number beyond the model and beside its gaps."""
         import rasterio
-        from rasterio.windows import Window
 
-        x, y = _transformer("EPSG:4326", self.crs).transform(longitude, latitude)
-        a, _, c, _, e, f = self.transform
-        column, row = (x - c) / a - 0.5, (y - f) / e - 0.5  # centres of pixels have whole numbers
+        row, column = self._pixels(longitude, latitude)
         window = _window(row, column, self.shape, 1)
         if window is None:
             return np.full(np.shape(longitude), np.nan)
-        first_row, rows, first_column, columns = window
         with rasterio.open(self.path) as file:
-            block = file.read(1, window=Window(first_column, first_row, columns, rows)).astype(np.float64)
-        if self.nodata is not None:
-            block[block == self.nodata] = np.nan
-        made = _bilinear(block, row - first_row, column - first_column)
+            block = self._read(file, *window)
+        made = _bilinear(block, row - window[0], column - window[2])
         if self.geoid is None:
             return made
         return _to_ellipsoid(self.geoid).transform(longitude, latitude, made)[2]
+
+    def relief(self, longitude: np.ndarray, latitude: np.ndarray) -> float:
+        """Difference between the highest and the lowest ground within _REACH_DEG of places, m."""
+        import rasterio
+
+        east = _REACH_DEG / np.cos(np.radians(np.minimum(np.abs(latitude), 89.0)))
+        around = [self._pixels(longitude + i * east, latitude + j * _REACH_DEG) for i in (-1, 1) for j in (-1, 1)]
+        ends = [[np.floor(np.nanmin(each)), np.ceil(np.nanmax(each)) + 1] for each in map(np.array, zip(*around))]
+        (first, last), (left, right) = (np.clip(end, 0, size).astype(int) for end, size in zip(ends, self.shape))
+        strip = max(1, _MOST_PIXELS // max(1, right - left))
+        low, high = np.inf, -np.inf
+        with rasterio.open(self.path) as file:
+            for row in range(first, last, strip):
+                block = self._read(file, row, min(strip, last - row), left, right - left)
+                known = block[np.isfinite(block)]
+                low, high = min(low, known.min(initial=np.inf)), max(high, known.max(initial=-np.inf))
+        return max(high - low, 0.0) + (0.0 if self.geoid is None else _GEOID_M)
+
+    def _pixels(self, longitude: np.ndarray, latitude: np.ndarray) -> tuple[np.ndarray, np.ndarray]:
+        """Rows and columns of places; centres of pixels have whole numbers."""
+        x, y = _transformer("EPSG:4326", self.crs).transform(longitude, latitude)
+        a, _, c, _, e, f = self.transform
+        if _in_degrees(self.crs):
+            x = _around(x, self.middle()[0])
+        return (y - f) / e - 0.5, (x - c) / a - 0.5
+
+    def _read(self, file: Any, row: int, rows: int, column: int, columns: int) -> np.ndarray:
+        """Heights as the file means them; not-a-number where it has none."""
+        from rasterio.windows import Window
+
+        block = file.read(1, window=Window(column, row, columns, rows), masked=True)
+        return block.astype(np.float64).filled(np.nan) * self.scale[0] + self.scale[1]
+
+    def goes_round(self) -> bool:
+        """Whether the model has all longitudes."""
+        return _in_degrees(self.crs) and abs(self.shape[1] * self.transform[0]) > 359.9
+
+    def middle(self) -> tuple[float, float]:
+        """The middle of the model in its own coordinates."""
+        a, _, c, _, e, f = self.transform
+        return c + a * self.shape[1] / 2, f + e * self.shape[0] / 2
 
 
 def _geoid_of(path: Any, crs: Any, heights: Optional[str]) -> Optional[str]:
@@ -98,6 +157,10 @@ def _geoid_of(path: Any, crs: Any, heights: Optional[str]) -> Optional[str]:
     from pyproj import CRS
 
     whole = CRS.from_wkt(crs.to_wkt())
+    if not whole.is_compound and len(whole.axis_info) == 3:
+        if heights not in (None, "ellipsoid") or whole.axis_info[2].unit_name != "metre":
+            raise ValueError(f"{path}: its heights are above the ellipsoid of {whole.name}, in {whole.axis_info[2].unit_name}")
+        return None
     vertical = [part.to_authority() for part in whole.sub_crs_list if part.is_vertical]
     named = "+".join(["EPSG:4326", vertical[0][1]]) if vertical and vertical[0] else None
     if heights is None and not vertical:
@@ -123,22 +186,33 @@ class MapGrid(NamedTuple):
         if spacing is not None and not (spacing > 0 and np.isfinite(spacing)):
             raise ValueError(f"a spacing of {spacing} makes no map")
         wanted = terrain.crs if crs is None else _horizontal(crs)
-        x, y = _transformer("EPSG:4326", wanted).transform(*_outline(product, terrain))
+        outline = _outline(product, terrain)
+        x, y = _transformer("EPSG:4326", wanted).transform(*outline)
+        if _in_degrees(wanted):
+            x = _around(x, float(np.mean(outline[0])))
         if crs is None and spacing is None:
             transform = terrain.transform
+            if _in_degrees(wanted):
+                x = x + 360.0 * np.round((terrain.middle()[0] - np.mean(x)) / 360.0)
         else:
             step = _spacing_of(terrain, wanted) if spacing is None else float(spacing)
+            if step > _COARSEST * max(np.ptp(x), np.ptp(y)):
+                raise ValueError(f"a spacing of {step:g} is far coarser than the image is wide")
             transform = (step, 0.0, step * np.floor(np.min(x) / step), 0.0, -step, step * np.ceil(np.max(y) / step))
-        return cls._around(wanted, transform, x, y, terrain if crs is None and spacing is None else None)
+            finest, pixel_m = _FINEST * _finest_m(product), _pixel_m(wanted, transform, (0, 0))
+            if not pixel_m > finest:
+                raise ValueError(f"a spacing of {step:g}, {pixel_m:.2g} m, is far finer than the image's pixels")
+        return cls._covering(wanted, transform, x, y, terrain if crs is None and spacing is None else None)
 
     @classmethod
-    def _around(cls, crs: str, transform: Any, x: np.ndarray, y: np.ndarray, limit: Optional[Terrain]) -> MapGrid:
+    def _covering(cls, crs: str, transform: Any, x: np.ndarray, y: np.ndarray, limit: Optional[Terrain]) -> MapGrid:
         a, _, c, _, e, f = transform
         columns, rows = (np.sort([np.min(v), np.max(v)]) for v in ((x - c) / a, (y - f) / e))
         first = np.floor([rows[0], columns[0]]).astype(int)
         last = np.ceil([rows[1], columns[1]]).astype(int)
         if limit is not None:
-            first, last = np.maximum(first, 0), np.minimum(last, limit.shape)
+            axes = slice(0, 1 if limit.goes_round() else 2)  # round the Earth columns go on beyond the seam
+            first[axes], last[axes] = np.maximum(first, 0)[axes], np.minimum(last, limit.shape)[axes]
         if (last <= first).any():
             raise ValueError("the elevation model and the image have no place in common")
         moved = (a, 0.0, c + a * first[1], 0.0, e, f + e * first[0])
@@ -148,6 +222,12 @@ class MapGrid(NamedTuple):
         """Coordinates of the pixels' centres: x of the columns, y of the rows."""
         a, _, c, _, e, f = self.transform
         return c + a * (np.arange(self.shape[1]) + 0.5), f + e * (np.arange(self.shape[0]) + 0.5)
+
+    def outline(self) -> tuple[np.ndarray, np.ndarray]:
+        """Longitudes and latitudes of places all over the map, degrees."""
+        a, _, c, _, e, f = self.transform
+        x, y = np.meshgrid(c + a * np.linspace(0, self.shape[1], 33), f + e * np.linspace(0, self.shape[0], 33))
+        return _transformer(self.crs, "EPSG:4326").transform(x, y)
 
     def places(self, row: int, column: int, rows: int, columns: int) -> tuple[np.ndarray, np.ndarray]:
         """Longitudes and latitudes of pixels, degrees; the place may lie beside the map."""
@@ -170,9 +250,18 @@ def _outline(product: Any, terrain: Terrain) -> tuple[np.ndarray, np.ndarray]:
     known = np.isfinite(longitude)
     if not known.any():
         raise ValueError("the image has no place on the ground")
+    first = longitude[known][0]  # an image is narrower than half a turn
+    longitude = _around(longitude, first)
     a, _, c, _, e, f = terrain.transform
     u, v = np.meshgrid(np.linspace(0, terrain.shape[1], 33), np.linspace(0, terrain.shape[0], 33))
     east, north = _transformer(terrain.crs, "EPSG:4326").transform(c + a * u, f + e * v)
+    if terrain.goes_round():
+        east = longitude[known]
+    elif _in_degrees(terrain.crs):  # whose columns go on in one direction
+        east = _around(east, c + a * u)
+        east = east + 360.0 * np.round((first - np.mean(east)) / 360.0)
+    else:
+        east = _around(east, first)
     west, south = max(longitude[known].min(), east.min()), max(latitude[known].min(), north.min())
     to_east, to_north = min(longitude[known].max(), east.max()), min(latitude[known].max(), north.max())
     if to_east <= west or to_north <= south:
@@ -183,10 +272,8 @@ def _outline(product: Any, terrain: Terrain) -> tuple[np.ndarray, np.ndarray]:
 
 def _spacing_of(terrain: Terrain, crs: str) -> float:
     """The model's spacing in units of another reference system, at its middle."""
-    a, _, c, _, e, f = terrain.transform
-    x, y = c + a * terrain.shape[1] / 2, f + e * terrain.shape[0] / 2
-    there = _transformer(terrain.crs, crs)
-    one, other = there.transform(x, y), there.transform(x, y + e)
+    (x, y), there = terrain.middle(), _transformer(terrain.crs, crs)
+    one, other = there.transform(x, y), there.transform(x, y + terrain.transform[4])
     return float(np.hypot(other[0] - one[0], other[1] - one[1]))
 
 
@@ -197,6 +284,15 @@ def _pixel_m(crs: str, transform: Any, shape: Any) -> float:
     longitude, latitude = _transformer(crs, "EPSG:4326").transform(np.array([x, x + a, x]), np.array([y, y, y + e]))
     corner, east, north = earth_fixed(latitude, longitude, np.zeros(3))
     return float(min(np.linalg.norm(east - corner), np.linalg.norm(north - corner)))
+
+
+def _finest_m(product: Any) -> float:
+    """Length of the shorter side of an image's pixel on the ellipsoid, in its middle, m."""
+    line, sample = (size / 2 for size in product.raster.shape)
+    times = product.grid.times([line, line + 1, line], [sample, sample, sample + 1])
+    seen = product.orbit.geometry(times.azimuth_time, times.range_time)
+    corner, below, beside = np.stack([seen.x, seen.y, seen.z], axis=-1)
+    return float(min(np.linalg.norm(below - corner), np.linalg.norm(beside - corner)))
 
 
 # --- Samples at places between them -------------------------------------------------------------------------------
@@ -301,24 +397,67 @@ def map_steps(east: Any, north: Any, latitude: np.ndarray, longitude: np.ndarray
     there = _transformer("EPSG:4326", grid.crs)
     x0, y0 = there.transform(longitude, latitude)
     x1, y1 = there.transform(ahead_longitude, ahead_latitude)
-    return (y1 - y0) / grid.transform[4], (x1 - x0) / grid.transform[0]
+    ahead = _around(x1 - x0, 0.0) if _in_degrees(grid.crs) else x1 - x0
+    return (y1 - y0) / grid.transform[4], ahead / grid.transform[0]
 
 
-def layover_and_shadow(height: np.ndarray, incidence: np.ndarray, steps: Any, pixel_m: float, inner: Any) -> np.ndarray:
-    """1 where another place along the line of sight's plane has the same range, 2 where one hides this one.
+LAYOVER, SHADOW, UNKNOWN = 1, 2, 4
 
-    The rays are taken as parallel over the few kilometres in question, and the ground as flat between places.
+
+def layover_and_shadow(
+    heights: Callable[[int, int], np.ndarray],
+    here: np.ndarray,
+    tangent: np.ndarray,
+    steps: Any,
+    pixel_m: float,
+    relief: float,
+) -> np.ndarray:
+    """LAYOVER where another place along the line of sight's plane has the same range, SHADOW where one hides this
+    one, UNKNOWN where height or sight are.
+
+    heights(rows, columns): terrain with so many more rows and columns on each side; here: its middle; tangent: of
+    the angle of incidence; steps: as of map_steps(); relief: of all terrain. The rays are taken as parallel over
+    the few kilometres in question, and the ground as flat between places. What is asked of a place hangs on its own
+    surroundings alone, whatever part of the map is made.
     """
-    rows, columns = np.indices(height.shape)[:, inner[0], inner[1]]
-    here, angle = height[inner], incidence[inner]
-    row_step, column_step = (step[inner] for step in steps)
-    reach = max(inner[0].start, inner[1].start)
-    mask = np.zeros(here.shape, np.uint8)
+    known = np.isfinite(here) & np.isfinite(tangent) & np.isfinite(steps[0]) & np.isfinite(steps[1])
+    mask = np.where(known, 0, UNKNOWN).astype(np.uint8)
+    if not known.any():
+        return mask
+    farthest = relief * max(tangent[known].max(), 1.0 / tangent[known].min())
+    reach = max(1, int(np.ceil(farthest / pixel_m)))
+    margin = [int(np.ceil(reach * np.abs(step[known]).max())) + 1 for step in steps]
+    around = heights(*margin)
+    low, high = np.nanmin(around), np.nanmax(around)
+    row, column = np.nonzero(known)
+    flat, height, slope = np.flatnonzero(known), here[known], tangent[known]
+    row_step, column_step = (step[known] for step in steps)
+    made = mask.ravel()
     for k in range(1, reach + 1):
         distance = k * pixel_m
-        nearer = _bilinear(height, rows + k * row_step, columns + k * column_step) - here
-        farther = _bilinear(height, rows - k * row_step, columns - k * column_step) - here
+        # Those that the lowest and the highest ground could still touch from here on.
+        rise, fall = np.maximum(high - height, 0.0), np.maximum(height - low, 0.0)
+        left = np.maximum(rise * np.maximum(slope, 1.0 / slope), fall / slope) > distance
+        if not left.all():
+            row, column, flat, height, slope, row_step, column_step = (
+                each[left] for each in (row, column, flat, height, slope, row_step, column_step)
+            )
+        if not flat.size:
+            break
+        nearer = _stepped(around, row + margin[0], column + margin[1], k * row_step, k * column_step) - height
+        farther = _stepped(around, row + margin[0], column + margin[1], -k * row_step, -k * column_step) - height
         with np.errstate(invalid="ignore"):
-            mask[nearer * np.tan(angle) > distance] |= 2
-            mask[(-nearer > distance * np.tan(angle)) | (farther > distance * np.tan(angle))] |= 1
+            made[flat[nearer * slope > distance]] |= SHADOW
+            made[flat[(-nearer > distance * slope) | (farther > distance * slope)]] |= LAYOVER
     return mask
+
+
+def _stepped(block: np.ndarray, row: Any, column: Any, down: np.ndarray, right: np.ndarray) -> np.ndarray:
+    """The block, bilinear, away from whole places within it; the same bits wherever the block begins."""
+    below, beside = np.floor(down), np.floor(right)
+    v, u = down - below, right - beside
+    first = (row + below.astype(np.int64)) * block.shape[1] + column + beside.astype(np.int64)
+    values = block.ravel()
+    upper = values[first] * (1.0 - u) + values[first + 1] * u
+    first += block.shape[1]
+    return upper * (1.0 - v) + (values[first] * (1.0 - u) + values[first + 1] * u) * v

@@ -6,6 +6,11 @@ import os
 from typing import Any
 
 
+def absolute(name: str) -> str:
+    """A file's name for other processes, whose folders are others; names of what is no file stay."""
+    return os.path.abspath(name) if os.path.exists(name) else name
+
+
 def file_name(path: Any) -> str:
     """A path as text; refused where the library would cut it short or could not read it."""
     name = os.fsdecode(path)

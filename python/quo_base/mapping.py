@@ -10,6 +10,7 @@ import numpy as np
 
 from . import _maps
 from ._maps import MapGrid, Terrain
+from ._paths import absolute
 from .product import Product
 
 __all__ = ["QUANTITIES", "geocode"]
@@ -23,14 +24,9 @@ QUANTITIES: dict[str, tuple[str, str]] = {
     "sample": ("", "sample of the image, from 0"),
     "incidence": ("degrees", "angle between the line of sight and the ellipsoid's normal"),
     "local_incidence": ("degrees", "angle between the line of sight and the terrain's normal"),
-    "mask": ("", "sum of 1 where layover and 2 where shadow lies"),
+    "mask": ("", "sum of 1 where layover and 2 where shadow lies, and 4 where the terrain is not known"),
 }
 """What can be had on the map: name, unit and meaning."""
-
-
-# Terrain hides or overlays what lies so many times its height away at most: the cotangent of the steepest look, and
-# the tangent of the flattest, of imaging radars in orbit (20 to 60 degrees of incidence).
-_STEEPEST = 2.75
 
 
 class _Job(NamedTuple):
@@ -42,6 +38,10 @@ class _Job(NamedTuple):
     grid: MapGrid
     resampling: str
     quantities: tuple[str, ...]
+    relief: float
+    """Of all the ground that can hide or overlay a place of the map, so that tiles see what the whole map sees, m."""
+    files: tuple[tuple[int, int], ...]
+    """Sizes and times of header, raster and model: maps of files that have changed have other names in a cluster."""
 
     def tile(self, row: int, column: int, rows: int, columns: int) -> dict[str, np.ndarray]:
         """Those quantities on rows x columns of the map from a place on."""
@@ -55,40 +55,31 @@ class _Tile:
     def __init__(self, job: _Job, product: Product, row: int, column: int, rows: int, columns: int) -> None:
         self._job = job
         self._product = product
-        self._inner = (slice(0, rows), slice(0, columns))
         self._place = (row, column, rows, columns)
-        self._locate(self._reach(product) if self._needs_terrain() else 0)
+        margin = int("local_incidence" in job.quantities)
+        self._inner = (slice(margin, margin + rows), slice(margin, margin + columns))
+        self.longitude, self.latitude, self.height = self._heights(margin, margin)
+        self.seen = product.orbit.to_radar(self.latitude, self.longitude, self.height)
+        found = product.grid.pixels(self.seen.azimuth_time, self.seen.range_time)
+        self.line, self.sample = np.asarray(found.line), np.asarray(found.sample)
 
-    def _needs_terrain(self) -> bool:
-        return bool({"mask", "local_incidence"} & set(self._job.quantities))
-
-    def _reach(self, product: Product) -> int:
-        """Pixels of the map over which the terrain around this part can hide it or fall on it; at least one."""
-        if "mask" not in self._job.quantities:
-            return 1
+    def _heights(self, more_rows: int, more_columns: int) -> tuple[np.ndarray, np.ndarray, np.ndarray]:
+        """Longitudes, latitudes and heights with so much more on each side."""
         row, column, rows, columns = self._place
-        reach = 1
-        for _ in range(8):  # each round sees the relief that the one before has let in
-            heights = self._heights(row - reach, column - reach, rows + 2 * reach, columns + 2 * reach)[2]
-            relief = float(np.nanmax(heights) - np.nanmin(heights)) if np.isfinite(heights).any() else 0.0
-            wanted = 1 + int(np.ceil(relief * _STEEPEST / self._job.grid.pixel_m))
-            if wanted <= reach:
-                break
-            reach = wanted
-        return reach
-
-    def _heights(self, row: int, column: int, rows: int, columns: int) -> tuple[np.ndarray, np.ndarray, np.ndarray]:
-        longitude, latitude = self._job.grid.places(row, column, rows, columns)
+        around = (row - more_rows, column - more_columns, rows + 2 * more_rows, columns + 2 * more_columns)
+        longitude, latitude = self._job.grid.places(*around)
         return longitude, latitude, self._job.terrain.heights(longitude, latitude)
 
-    def _locate(self, margin: int) -> None:
+    def _heights_alone(self, more_rows: int, more_columns: int) -> np.ndarray:
+        """The heights of _heights(), in strips, as only they are kept."""
         row, column, rows, columns = self._place
-        self._inner = (slice(margin, margin + rows), slice(margin, margin + columns))
-        around = (row - margin, column - margin, rows + 2 * margin, columns + 2 * margin)
-        self.longitude, self.latitude, self.height = self._heights(*around)
-        self.seen = self._product.orbit.to_radar(self.latitude, self.longitude, self.height)
-        found = self._product.grid.pixels(self.seen.azimuth_time, self.seen.range_time)
-        self.line, self.sample = np.asarray(found.line), np.asarray(found.sample)
+        made = np.empty((rows + 2 * more_rows, columns + 2 * more_columns))
+        strip = max(1, _STRIP // made.shape[1])
+        for first in range(0, made.shape[0], strip):
+            count = min(strip, made.shape[0] - first)
+            places = self._job.grid.places(row - more_rows + first, column - more_columns, count, made.shape[1])
+            made[first : first + count] = self._job.terrain.heights(*places)
+        return made
 
     def quantities(self) -> dict[str, np.ndarray]:
         """The quantities that are asked for, by name."""
@@ -107,13 +98,10 @@ class _Tile:
     def _height(self) -> np.ndarray:
         return self.height[self._inner]
 
-    def _incidence_of_all(self) -> np.ndarray:
-        seen = self.seen
-        made = self._product.orbit.quantities(["incidence"], seen.azimuth_time, seen.range_time, None, self.height)
-        return np.asarray(made["incidence"])
-
     def _incidence(self) -> np.ndarray:
-        return self._incidence_of_all()[self._inner]
+        azimuth, slant, height = (each[self._inner] for each in (*self.seen[:2], self.height))
+        made = self._product.orbit.quantities(["incidence"], azimuth, slant, None, height)
+        return np.asarray(made["incidence"])
 
     def _sight(self) -> tuple[np.ndarray, np.ndarray]:
         """Unit vectors from the ground to the platform, and the ground, both (rows, columns, 3), Earth-fixed."""
@@ -134,8 +122,14 @@ class _Tile:
         sight, _ = self._sight()
         east, north = _maps.horizontal(sight, self.latitude, self.longitude)
         steps = _maps.map_steps(east, north, self.latitude, self.longitude, self._job.grid)
+        inner = self._inner
         return _maps.layover_and_shadow(
-            self.height, np.radians(self._incidence_of_all()), steps, self._job.grid.pixel_m, self._inner
+            self._heights_alone,
+            self.height[inner],
+            np.tan(np.radians(self._incidence())),
+            tuple(step[inner] for step in steps),
+            self._job.grid.pixel_m,
+            self._job.relief,
         )
 
 
@@ -148,18 +142,18 @@ def geocode(
     quantities: Sequence[str] = ("image",),
     *,
     heights: Optional[str] = None,
-    chunks: Optional[int] = None,
+    chunks: Union[int, str, None] = None,
 ) -> Any:
     """The product's image as a map: an xarray.Dataset with one variable for each quantity.
 
-    product: as its file has it, so that what was changed is saved before. dem: elevation model, any file that
-    rasterio reads. heights: what its heights stand on, "ellipsoid" (WGS84), "egm96" or "egm2008"; unless told, what
+    product: as its file has it; one with changes that are not saved is refused. dem: elevation model, any file that
+    rasterio reads, in metres once its scale is applied. heights: what its heights stand on, "ellipsoid" (WGS84), "egm96" or "egm2008"; unless told, what
     the file names, and one that names nothing is refused. Geoid heights are converted by pyproj, or refused where
     its grids are missing. crs and spacing (in units of crs): the map's reference system and pixels; unless given
-    those of the elevation model.
+    those of the elevation model. What is far finer than the image's pixels or coarser than all of it is refused.
     The map covers the model as far as the image may reach. resampling: "nearest", "bilinear" or "sinc" (eight
-    samples each way). quantities: see QUANTITIES. chunks: pixels of a tile's side; then the variables are dask
-    arrays of tiles that are made when they are asked for, on any scheduler. Not-a-number where there is no image.
+    samples each way). quantities: see QUANTITIES. chunks: pixels of a tile's side, or "auto"; then the variables are
+    dask arrays of tiles that are made when they are asked for, on any scheduler. Not-a-number where there is no image.
 
     Amplitudes of complex images are interpolated, not the samples: their phase turns too fast for a neighbour's.
     """
@@ -168,10 +162,38 @@ def geocode(
     held = product if isinstance(product, Product) else Product(product)
     if held.path is None:
         raise ValueError("a product in memory has no raster to map")
+    if isinstance(product, Product) and _unsaved(held):
+        raise ValueError(f"the product has changes that {held.path} does not have: save() it before")
     terrain = Terrain.of(dem, heights)
     grid = MapGrid.over(held, terrain, crs, spacing)
-    job = _Job(held.path, held.raster.path, terrain, grid, resampling, tuple(quantities))
-    return _dataset(job, _eager(job) if chunks is None else _lazy(job, chunks))
+    relief = terrain.relief(*grid.outline()) if "mask" in quantities else 0.0
+    names = (absolute(held.path), absolute(held.raster.path))
+    files = tuple(map(_stamp, (*names, terrain.path)))
+    job = _Job(*names, terrain, grid, resampling, tuple(quantities), relief, files)
+    return _dataset(job, _eager(job) if chunks is None else _lazy(job, chunks if isinstance(chunks, int) else _TILE))
+
+
+def _stamp(name: str) -> tuple[int, int]:
+    """Size and time of a file; of one that is none, nothing."""
+    try:
+        told = os.stat(name)
+    except OSError:
+        return -1, -1
+    return told.st_size, told.st_mtime_ns
+
+
+def _unsaved(product: Product) -> bool:
+    """Whether a product differs from its file by more than the digits that headers usually have."""
+    saved = Product(product.path)
+    return list(saved) != list(product) or any(
+        not _alike(value, other) for (_, value), (_, other) in zip(product.walk(), saved.walk())
+    )
+
+
+def _alike(one: Any, other: Any) -> bool:
+    if isinstance(one, (float, np.ndarray)):
+        return np.shape(one) == np.shape(other) and np.allclose(one, other, rtol=1e-14, atol=0.0, equal_nan=True)
+    return bool(one == other)
 
 
 def _need(*modules: str) -> None:
@@ -180,8 +202,8 @@ def _need(*modules: str) -> None:
             raise ModuleNotFoundError(f"geocode() needs {module}, Debian's python3-{module}", name=module)
 
 
-def _check(resampling: str, quantities: Sequence[str], chunks: Optional[int]) -> None:
-    if chunks is not None and chunks < 1:
+def _check(resampling: str, quantities: Sequence[str], chunks: Union[int, str, None]) -> None:
+    if chunks not in (None, "auto") and not (isinstance(chunks, int) and chunks >= 1):
         raise ValueError(f"tiles of {chunks} pixels make no map")
     if resampling not in _maps.RESAMPLINGS:
         raise ValueError(f"resampling is one of {', '.join(_maps.RESAMPLINGS)}, not {resampling!r}")
@@ -191,6 +213,7 @@ def _check(resampling: str, quantities: Sequence[str], chunks: Optional[int]) ->
 
 
 _TILE = 512
+_STRIP = 2**18  # pixels whose places are in memory at a time beside a tile's own
 
 
 def _spans(length: int, size: int) -> list[tuple[int, int]]:
@@ -230,7 +253,7 @@ def _lazy(job: _Job, size: int) -> dict[str, Any]:
     for name in job.quantities:
         key = f"{name}-{token}"
         layer = {(key, i, j): (operator.getitem, (f"tile-{token}", i, j), name) for i, j in places}
-        layers = {f"tile-{token}": tiles, key: layer}
+        layers: dict[str, Any] = {f"tile-{token}": tiles, key: layer}
         graph = HighLevelGraph(layers, {f"tile-{token}": set(), key: {f"tile-{token}"}})
         made[name] = da.Array(graph, key, chunks, dtype=_dtype(name))
     return made

@@ -5,6 +5,8 @@ from __future__ import annotations
 import os
 from typing import Any, ClassVar, NamedTuple, Union
 
+import numpy as np
+
 from . import _core
 from ._arrays import broadcast, plain
 from ._paths import file_name
@@ -41,6 +43,14 @@ def _restored(kind: type, fields: dict[str, Any]) -> _Model:
     return kind(**fields)
 
 
+def _known(times: Any) -> np.ndarray:
+    """Times that have an index, which no index could tell apart from 0."""
+    (made,) = broadcast(times)
+    if np.isnan(made).any():
+        raise ValueError("a time that is no number has no index")
+    return made
+
+
 class Region(_Model):
     """A rectangle of an image in time: FastStartTime (two-way range time, s), SlowStartTime (s since 1985), their
     Delta (s), TimeLength (s), and Samples and Lines. `Region(**product.ROI)` takes a product's."""
@@ -66,16 +76,27 @@ class Region(_Model):
         self._header.write(file_name(path), section)
 
     def __and__(self, other: Region) -> Region:
-        """What two regions share, on this one's grid."""
-        return Region._of(self._header.intersect(other._header))
+        """What two regions share, on this one's grid; refused where that is nothing."""
+        if not isinstance(other, Region):
+            return NotImplemented
+        shared = Region._of(self._header.intersect(other._header))
+        if shared.Lines < 1 or shared.Samples < 1:
+            raise ValueError("the regions have nothing in common")
+        return shared
 
     def samples(self, range_time: Any) -> Any:
         """Indices of the samples nearest to range times."""
-        return self._header.samples(*broadcast(range_time))[()]
+        return self._header.samples(_known(range_time))[()]
 
     def lines(self, azimuth_time: Any) -> Any:
         """Indices of the lines nearest to azimuth times."""
-        return self._header.lines(*broadcast(to_seconds(azimuth_time)))[()]
+        return self._header.lines(_known(to_seconds(azimuth_time)))[()]
+
+
+def _headers(*regions: Region) -> list[Any]:
+    if not all(isinstance(each, Region) for each in regions):
+        raise TypeError("a Region is needed")
+    return [each._header for each in regions]
 
 
 class Polynomial(_Model):
@@ -128,11 +149,11 @@ class Coregistration(_Model):
 
     def with_samples(self, master: Region, slave: Region) -> Coregistration:
         """The mapping whose sample form is made of its time form."""
-        return Coregistration._of(self._header.with_samples(master._header, slave._header))
+        return Coregistration._of(self._header.with_samples(*_headers(master, slave)))
 
     def with_times(self, master: Region, slave: Region) -> Coregistration:
         """The mapping whose time form is made of its sample form."""
-        return Coregistration._of(self._header.with_times(master._header, slave._header))
+        return Coregistration._of(self._header.with_times(*_headers(master, slave)))
 
 
 class Configuration(Section):

@@ -7,7 +7,7 @@ from typing import Any, NamedTuple, Optional, Sequence
 import numpy as np
 
 from . import _core
-from ._arrays import broadcast, contiguous, doubles, plain
+from ._arrays import broadcast, contiguous, doubles, plain, whole_number
 from .times import to_seconds
 
 __all__ = ["Finding", "Geometry", "Ground", "Orbit", "Sighting"]
@@ -101,8 +101,14 @@ class Orbit:
         (n, 3), m/s; wavelength: m, needed where a Doppler takes part; look: negative looks left, needed on the way
         to the ground.
         """
-        held = [contiguous(doubles(each)) for each in (positions, velocities)]
-        self._orbit = _core.Orbit(float(to_seconds(first_time)), spacing, held[0], held[1], wavelength, look)
+        self._orbit = _core.Orbit(
+            float(to_seconds(first_time)),
+            float(spacing),
+            contiguous(doubles(positions)),
+            contiguous(doubles(velocities)),
+            None if wavelength is None else float(wavelength),
+            None if look is None else whole_number(look),
+        )
 
     @classmethod
     def _of(cls, orbit: _core.Orbit) -> Orbit:
@@ -124,16 +130,45 @@ class Orbit:
     def __len__(self) -> int:
         return len(self.positions)
 
-    first_time = property(lambda self: self._orbit.first_time, doc="Time of the first vector, seconds since 1985.")
-    spacing = property(lambda self: self._orbit.spacing, doc="Time from vector to vector, s.")
-    positions = property(lambda self: self._orbit.positions, doc="Positions of the vectors, (n, 3), m: a copy.")
-    velocities = property(lambda self: self._orbit.velocities, doc="Their velocities, (n, 3), m/s: a copy.")
-    wavelength = property(lambda self: self._orbit.wavelength, doc="Radar wavelength, m; None where not known.")
-    look = property(lambda self: self._orbit.look, doc="Look sign, negative left; None where not known.")
-    ascending = property(lambda self: self._orbit.ascending, doc="Whether the first vector flies north.")
-    fit_error = property(
-        lambda self: self._orbit.fit_error, doc="Estimate of how far the model is off a smooth orbit, m."
-    )
+    @property
+    def first_time(self) -> float:
+        """Time of the first vector, seconds since 1985."""
+        return self._orbit.first_time
+
+    @property
+    def spacing(self) -> float:
+        """Time from vector to vector, s."""
+        return self._orbit.spacing
+
+    @property
+    def positions(self) -> np.ndarray:
+        """Positions of the vectors, (n, 3), m: a copy."""
+        return self._orbit.positions
+
+    @property
+    def velocities(self) -> np.ndarray:
+        """Their velocities, (n, 3), m/s: a copy."""
+        return self._orbit.velocities
+
+    @property
+    def wavelength(self) -> Optional[float]:
+        """Radar wavelength, m; None where not known."""
+        return self._orbit.wavelength
+
+    @property
+    def look(self) -> Optional[int]:
+        """Look sign, negative left; None where not known."""
+        return self._orbit.look
+
+    @property
+    def ascending(self) -> bool:
+        """Whether the first vector flies north."""
+        return self._orbit.ascending
+
+    @property
+    def fit_error(self) -> float:
+        """Estimate of how far the model is off a smooth orbit, m."""
+        return self._orbit.fit_error
 
     def times(self) -> np.ndarray:
         """Times of the vectors, (n,), seconds since 1985."""
@@ -178,7 +213,7 @@ class Orbit:
 
     def resample(self, spacing: float) -> Orbit:
         """The orbit with vectors at most `spacing` seconds apart, as precise as its own vectors allow."""
-        return Orbit._of(self._orbit.resampled(spacing))
+        return Orbit._of(self._orbit.resampled(float(spacing)))
 
     def check(self) -> list[Finding]:
         """What is wrong with the vectors: gaps, duplicates, steps, velocities that are not the derivative."""

@@ -44,7 +44,10 @@ class ParameterFile:
         return np.array(_core.parameter_numbers(self.path, section, key, count))
 
     def __setitem__(self, key: Key, value: Any) -> None:
-        """Sets a text as it stands, a number, or a list of numbers, with 15 digits."""
+        """Sets a text of one line as it stands, a number, or a list of numbers, with 15 digits."""
+        for text in (*key, value):
+            if isinstance(text, str) and set("\r\n\0") & set(text):
+                raise ValueError("a parameter is one line, without zeros")
         if isinstance(value, str):
             _core.set_parameter_text(self.path, *key, value)
             return

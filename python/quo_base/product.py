@@ -10,7 +10,7 @@ import numpy as np
 
 from . import _core
 from ._arrays import broadcast, plain
-from ._paths import file_name
+from ._paths import absolute, file_name
 from .orbit import Orbit
 from .raster import Raster
 from .times import to_seconds
@@ -70,7 +70,7 @@ class Section(MutableMapping):
         return self._record.get(name)
 
     def __setitem__(self, name: str, value: Any) -> None:
-        self._record.update({name: value})
+        self.update({name: value})
 
     def __delitem__(self, name: str) -> None:
         raise TypeError("fields of a header object stay")
@@ -103,7 +103,10 @@ class Section(MutableMapping):
 
     def update(self, *values: Any, **fields: Any) -> None:
         """Sets several fields in one step, all or none; lengths of arrays together with the arrays."""
-        self._record.update(dict(*values, **fields))
+        named = dict(*values, **fields)
+        if not all(isinstance(name, str) for name in named):
+            raise TypeError("fields are named by texts")
+        self._record.update(named)
 
     def describe(self, name: str) -> Field:
         """Unit, meaning and bounds of a field."""
@@ -114,7 +117,14 @@ class Section(MutableMapping):
             return NotImplemented
         return list(self) == list(other) and all(_same(self[name], other[name]) for name in self)
 
+    def __reduce__(self) -> tuple:
+        root = self._name.split("/")[0]
+        names = [name for name in self._header.sections() if name.split("/")[0] == root]
+        return _restored_section, (self._name, {name: dict(Section(self._header, name)) for name in names})
+
     def __repr__(self) -> str:
+        if self._header.record(self._name) is None:
+            return f"<Section {self._name}, which is there no more>"
         width = max((len(name) for name in self), default=0)
         rows = [
             f"  {name:{width}}  {_shown(value)} {self.describe(name).unit}".rstrip()
@@ -124,6 +134,24 @@ class Section(MutableMapping):
 
     def _repr_html_(self) -> str:
         return _html({self._name: self})
+
+
+def _restored_section(name: str, content: dict[str, dict[str, Any]]) -> Section:
+    return Section(_header_of(content), name)
+
+
+def _header_of(content: dict[str, dict[str, Any]]) -> _core.Header:
+    product = Product()
+    for section, fields in content.items():
+        product.add(section, **fields)
+    return product._header
+
+
+class _Closed:
+    """Stands for the header of a closed product."""
+
+    def __getattr__(self, name: str) -> Any:
+        raise ValueError("the product is closed")
 
 
 def _html(sections: Mapping[str, Section]) -> str:
@@ -171,13 +199,20 @@ class Grid:
     def __init__(self, grid: _core.Grid) -> None:
         self._grid = grid
 
-    bursts = property(lambda self: self._grid.bursts, doc="Number of bursts; 0 for an image without.")
-    ground_range = property(
-        lambda self: self._grid.ground_range, doc="Whether samples are equally spaced on the ground."
-    )
-    lines_at_one_time = property(
-        lambda self: self._grid.lines_at_one_time, doc="Whether all samples of a line have one azimuth time."
-    )
+    @property
+    def bursts(self) -> int:
+        """Number of bursts; 0 for an image without."""
+        return self._grid.bursts
+
+    @property
+    def ground_range(self) -> bool:
+        """Whether samples are equally spaced on the ground."""
+        return self._grid.ground_range
+
+    @property
+    def lines_at_one_time(self) -> bool:
+        """Whether all samples of a line have one azimuth time."""
+        return self._grid.lines_at_one_time
 
     def times(self, line: Any, sample: Any) -> PixelTimes:
         """Times of pixels; whole numbers are the centres of pixels."""
@@ -245,12 +280,9 @@ class Product(Mapping):
         raise AttributeError(f"the product has no {name}")
 
     def __setattr__(self, name: str, value: Any) -> None:
-        if name == "orbit":
-            if not isinstance(value, Orbit):
-                raise TypeError("an Orbit is needed")
-            self._header.set_orbit(value._orbit)
-        else:
+        if name != "orbit":
             raise AttributeError(f"{name} cannot be set; sections are added by add()")
+        object.__setattr__(self, name, value)
 
     def __dir__(self) -> list[str]:
         return [*super().__dir__(), *(name for name in self if "/" not in name)]
@@ -281,6 +313,8 @@ class Product(Mapping):
                 yield f"{name}/{field}", value
 
     def __repr__(self) -> str:
+        if isinstance(self._header, _Closed):
+            return f"<Product {self._path or 'in memory'}, closed>"
         rows = [f"  {name}: {len(section)} fields" for name, section in self.items()]
         return "\n".join([f"<Product {self._path or 'in memory'}>", *rows])
 
@@ -289,7 +323,10 @@ class Product(Mapping):
 
     # --- Files and copies ----------------------------------------------------------------------------------------
 
-    path = property(lambda self: self._path, doc="Name of the header file; None for a product in memory.")
+    @property
+    def path(self) -> Optional[str]:
+        """Name of the header file; None for a product in memory."""
+        return self._path
 
     def save(self, path: Optional[Path] = None, exact: bool = False) -> None:
         """Writes the header: into its own file, or another, whose other sections stay.
@@ -304,6 +341,17 @@ class Product(Mapping):
         if self._path is None:
             self._set("_path", target)
 
+    def close(self) -> None:
+        """Gives the header up: all further use of the product is refused. Sections, orbits, grids and rasters that
+        it gave stay."""
+        self._set("_header", _Closed())
+
+    def __enter__(self) -> Product:
+        return self
+
+    def __exit__(self, *_: object) -> None:
+        self.close()
+
     def clone(self) -> Product:
         """A copy that can be changed apart from this one."""
         copy = Product.__new__(Product)
@@ -312,7 +360,9 @@ class Product(Mapping):
         return copy
 
     def __reduce__(self) -> tuple:
-        return _restored, (self._path, self._raster, {name: dict(section) for name, section in self.items()})
+        content = {name: dict(section) for name, section in self.items()}
+        path, raster = (name and absolute(name) for name in (self._path, self._raster))
+        return _restored, (path, raster, content, self._header.grid_broken)
 
     # --- Geometry and samples ------------------------------------------------------------------------------------
 
@@ -321,9 +371,16 @@ class Product(Mapping):
         """The orbit through the product's state vectors, with its wavelength and look side, as they are now."""
         return Orbit._of(self._header.orbit())
 
+    @orbit.setter
+    def orbit(self, value: Orbit) -> None:
+        if not isinstance(value, Orbit):
+            raise TypeError("an Orbit is needed")
+        self._header.set_orbit(value._orbit)
+
     @property
     def grid(self) -> Grid:
-        """Where pixels stand in time: the section "ImageGrid", else the region that the file told."""
+        """Where pixels stand in time: the section "ImageGrid", else the region "ROI" where that has the raster's
+        size, as they are now."""
         return Grid(self._header.grid())
 
     @property
@@ -331,6 +388,7 @@ class Product(Mapping):
         """The product's raster, which is read slice by slice."""
         if self._path is None:
             raise ValueError("a product in memory has no raster")
+        self._header.sections()  # refused once the product is closed
         return Raster(self._raster, header=self._path)
 
     def evaluate(self, quantity: str, range_time: Any, azimuth_time: Any, interpolate: bool = False) -> Any:
@@ -341,13 +399,14 @@ class Product(Mapping):
         around the azimuth time; else the one at or after it.
         """
         arrays = broadcast(range_time, to_seconds(azimuth_time))
-        return self._header.evaluate(quantity, interpolate, *arrays)[()]
+        return self._header.evaluate(str(quantity), bool(interpolate), *arrays)[()]
 
 
-def _restored(path: Optional[str], raster: Optional[str], content: dict[str, dict[str, Any]]) -> Product:
+def _restored(
+    path: Optional[str], raster: Optional[str], content: dict[str, dict[str, Any]], grid_broken: bool
+) -> Product:
     product = Product()
-    for section, fields in content.items():
-        product.add(section, **fields)
-    product._set("_path", path)
-    product._set("_raster", raster)
+    for name, value in (("_header", _header_of(content)), ("_path", path), ("_raster", raster)):
+        product._set(name, value)
+    product._header.grid_broken = grid_broken
     return product

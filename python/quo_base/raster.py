@@ -4,14 +4,16 @@ from __future__ import annotations
 
 import operator
 import os
+from threading import Lock
 from types import TracebackType
 from typing import Any, Optional, Union
 
 import numpy as np
 
 from . import _core
-from ._arrays import contiguous
-from ._paths import file_name
+from ._arrays import contiguous, whole_number
+from ._paths import absolute, file_name
+from .errors import from_failure
 
 __all__ = ["Raster", "RasterWriter"]
 
@@ -71,11 +73,20 @@ def _squeezed(array: np.ndarray, lines: _Span, samples: _Span) -> Any:
     return array[0 if lines.single else slice(None), 0 if samples.single else slice(None)]
 
 
+def _unmasked(value: Any) -> np.ndarray:
+    """Values as an array; masked ones are not-a-number."""
+    if np.ma.is_masked(value):
+        if value.dtype.kind not in "fc":
+            raise ValueError("masked integers have no value to be written")
+        return value.filled(np.nan)
+    return np.asarray(value)
+
+
 def _block(value: Any, lines: _Span, samples: _Span) -> np.ndarray:
     """Values for a block without steps, in its shape."""
     if lines.places.step != 1 or samples.places.step != 1:
         raise IndexError("rasters are written without steps")
-    array = np.asarray(value)
+    array = _unmasked(value)
     if lines.single and not samples.single and array.ndim == 1:
         array = array[np.newaxis, :]
     elif samples.single and not lines.single and array.ndim == 1:
@@ -83,14 +94,31 @@ def _block(value: Any, lines: _Span, samples: _Span) -> np.ndarray:
     return np.broadcast_to(array, (lines.count, samples.count))
 
 
-def _storable(block: np.ndarray, kind: str) -> np.ndarray:
-    """Values in a type that the library converts into samples of this kind."""
-    dtype = block.dtype.newbyteorder("=")
-    if dtype.kind == "c" or (kind == "c" and dtype.names is None):
-        dtype = np.dtype(np.complex64 if dtype == np.complex64 else np.complex128)
-    elif dtype not in _STORED or dtype == np.int8:
-        dtype = np.dtype(np.float64)
-    return contiguous(block.astype(dtype, casting="same_kind", copy=False))
+def _converted(block: np.ndarray, dtype: np.dtype) -> np.ndarray:
+    """Values as samples of a type. Real numbers that become integers are rounded half away from zero and held at
+    their bounds, no number becomes 0; complex ones become pairs of such, and are refused among real samples."""
+    if block.dtype.newbyteorder("=") == dtype:
+        return block.astype(dtype, copy=False)
+    if block.dtype.kind not in "biufc":
+        raise TypeError(f"samples of {dtype} cannot be made of {block.dtype}")
+    if dtype.names is not None:
+        pairs = np.empty(block.shape, dtype)
+        pairs["real"], pairs["imag"] = _converted(block.real, dtype[0]), _converted(block.imag, dtype[1])
+        return pairs
+    if block.dtype.kind == "c" and dtype.kind != "c":
+        raise from_failure(1, "writing a raster", "complex samples are no real ones", "", "", 0, 0)
+    return _held(block, dtype) if dtype.kind == "i" else block.astype(dtype)
+
+
+def _held(block: np.ndarray, dtype: np.dtype) -> np.ndarray:
+    if block.dtype.kind == "f":
+        block = block.astype(np.float64)
+        whole = np.trunc(block)
+        block = np.where(np.abs(block - whole) == 0.5, whole + np.sign(block), np.rint(block))
+        block = np.where(np.isnan(block), 0.0, block)
+    elif block.dtype.kind == "b":
+        return block.astype(dtype)
+    return np.clip(block, np.iinfo(dtype).min, np.iinfo(dtype).max).astype(dtype)
 
 
 class Raster:
@@ -117,27 +145,48 @@ class Raster:
             raise TypeError("a raster's file or a header is needed")
         self._path = None if path is None else file_name(path)
         self._header = f"{self._path}.hdr" if header is None else file_name(header)
-        self._wanted = None if dtype is None else np.dtype(dtype)
+        self._wanted = None if dtype is None else np.dtype(dtype).newbyteorder("=")
         if dtype is not None:
             _cell_type(dtype)
         self._opened: Optional[_core.RasterReader] = None
+        self._closed = False
 
     @property
     def _reader(self) -> _core.RasterReader:
+        if self._closed:
+            raise ValueError(f"{self.path} is closed")
         if self._opened is None:
             self._opened = _core.RasterReader(self._header, self._path)
         return self._opened
 
+    def close(self) -> None:
+        """Closes the file, once slices that other threads are reading are there; all further use is refused."""
+        self._opened, self._closed = None, True
+
+    def __enter__(self) -> Raster:
+        return self
+
+    def __exit__(self, *_: object) -> None:
+        self.close()
+
     def __reduce__(self) -> tuple:
-        return _reopened, (self._path, self._header, self._wanted)
+        return _reopened, (self._path and absolute(self._path), absolute(self._header), self._wanted)
 
     def __repr__(self) -> str:
         if self._opened is None:
             return f"<Raster: {self.path}>"
         return f"<Raster: {self.path}, {self.shape[0]} lines of {self.shape[1]} samples, {self.dtype}>"
 
-    path = property(lambda self: self._path or self._header[:-4], doc="Name of the raster file.")
-    shape = property(lambda self: (self._reader.lines, self._reader.samples), doc="Lines and samples of a line.")
+    @property
+    def path(self) -> str:
+        """Name of the raster file."""
+        return self._path or self._header[:-4]
+
+    @property
+    def shape(self) -> tuple[int, int]:
+        """Lines and samples of a line."""
+        return (self._reader.lines, self._reader.samples)
+
     ndim = 2
 
     @property
@@ -186,7 +235,7 @@ class Raster:
 
     def __setitem__(self, key: Any, value: Any) -> None:
         lines, samples = _spans(key, self.shape)
-        block = _storable(_block(value, lines, samples), self.dtype.kind)
+        block = contiguous(_converted(_block(value, lines, samples), self.stored_dtype))
         place = (lines.first, lines.count, samples.first, samples.count)
         if block.size:
             _core.overwrite(self.path, *place, _cell_type(block.dtype), block)
@@ -194,6 +243,43 @@ class Raster:
 
 def _reopened(path: Optional[str], header: str, dtype: Any) -> Raster:
     return Raster(path, header=header, dtype=dtype)
+
+
+class _Covered:
+    """What has been written of a raster: few rectangles, as those that come in order grow together."""
+
+    def __init__(self, shape: tuple[int, int]) -> None:
+        self._shape = shape
+        self._parts: list[tuple[int, int, int, int]] = []  # first line, last + 1, first sample, last + 1
+        self._lock = Lock()
+
+    def add(self, line: int, lines: int, sample: int, samples: int) -> None:
+        part = (line, line + lines, sample, sample + samples)
+        with self._lock:
+            while self._parts and (joined := _joined(self._parts[-1], part)):
+                self._parts.pop()
+                part = joined
+            self._parts.append(part)
+
+    def missing(self) -> int:
+        """How many samples no rectangle holds."""
+        parts = np.array([*self._parts, (0, self._shape[0], 0, self._shape[1])], np.int64)
+        edges = [np.unique(parts[:, place]) for place in (slice(0, 2), slice(2, 4))]
+        held = np.zeros((len(edges[0]) - 1, len(edges[1]) - 1), bool)
+        for first, last, left, right in parts[:-1]:
+            lines, samples = np.searchsorted(edges[0], (first, last)), np.searchsorted(edges[1], (left, right))
+            held[slice(*lines), slice(*samples)] = True
+        sizes = np.multiply.outer(*(np.diff(edge) for edge in edges))
+        return int(sizes[~held].sum())
+
+
+def _joined(one: tuple[int, int, int, int], other: tuple[int, int, int, int]) -> Optional[tuple[int, int, int, int]]:
+    """Two rectangles as one, where the other goes on where the one ends."""
+    if one[:2] == other[:2] and one[2] <= other[2] <= one[3]:
+        return (*one[:2], one[2], max(one[3], other[3]))
+    if one[2:] == other[2:] and one[0] <= other[0] <= one[1]:
+        return (one[0], max(one[1], other[1]), *one[2:])
+    return None
 
 
 class RasterWriter:
@@ -217,25 +303,35 @@ class RasterWriter:
         """shape: lines, samples of a line; byte_order: "little" or "big"; row_prefix: bytes before each line."""
         if byte_order not in ("little", "big"):
             raise ValueError('the byte order is "little" or "big"')
+        if len(shape) != 2:
+            raise ValueError("a raster has lines and samples, no other axes")
         self.path = file_name(path)
-        self.shape = (operator.index(shape[0]), operator.index(shape[1]))
+        self.shape = (whole_number(shape[0]), whole_number(shape[1]))
         self.dtype = _STORED[_cell_type(dtype)].newbyteorder(">" if byte_order == "big" else "<")
         self._writer = _core.RasterWriter(
-            self.path, *self.shape, _cell_type(dtype), byte_order == "big", row_prefix
+            self.path, *self.shape, _cell_type(dtype), byte_order == "big", whole_number(row_prefix)
         )
+        self._covered = _Covered(self.shape)
 
     def __setitem__(self, key: Any, value: Any) -> None:
         lines, samples = _spans(key, self.shape)
-        block = _block(value, lines, samples).astype(self.dtype, casting="same_kind", copy=False)
+        native = self.dtype.newbyteorder("=")
+        block = _converted(_block(value, lines, samples), native).astype(self.dtype, copy=False)
         if block.size:
             self._writer.write(lines.first, samples.first, np.ascontiguousarray(block))
+            self._covered.add(lines.first, lines.count, samples.first, samples.count)
 
     def commit(self) -> None:
-        """All samples are written: raster and description take their names."""
+        """All samples are written: raster and description take their names. Refused, and the new raster given up,
+        where samples never were."""
+        if missing := self._covered.missing():
+            self.discard()
+            raise from_failure(5, "completing a raster", f"{missing} samples were never written", "", "", 0, 0)
         self._writer.commit()
 
     def discard(self) -> None:
         """Gives the new raster up."""
+        self._covered = _Covered((0, 0))
         self._writer.discard()
 
     def __enter__(self) -> RasterWriter:

@@ -7,7 +7,7 @@ from typing import Any, Callable, NamedTuple
 import numpy as np
 
 from . import _core
-from ._arrays import broadcast, contiguous, doubles, samples
+from ._arrays import broadcast, contiguous, doubles, samples, whole_number
 
 __all__ = [
     "Fit",
@@ -31,7 +31,10 @@ def engine() -> str:
 
 def fast_length(n: int) -> int:
     """First length from n on whose prime factors are 2, 3 and 5 only."""
-    return _core.fast_length(n)
+    made = _core.fast_length(whole_number(n))
+    if n < 1 or made < n:
+        raise ValueError(f"there is no length from {n} on")
+    return made
 
 
 def _direction(inverse: bool, scaled: bool) -> int:
@@ -72,6 +75,8 @@ def rfft(values: Any, axis: int = -1) -> np.ndarray:
 def irfft(spectrum: Any, n: int, axis: int = -1) -> np.ndarray:
     """The n real values, float32, of their n // 2 + 1 frequencies along an axis; scaled."""
     array = samples(spectrum, np.complex64, np.ndim(spectrum))
+    if n < 1:
+        raise ValueError(f"{n} values have no frequencies")
     if array.shape[axis] != n // 2 + 1:
         raise ValueError(f"{n} values have {n // 2 + 1} frequencies, not {array.shape[axis]}")
     return _along(array, axis, lambda image: _core.fft_real(_packed(image, n), -1, 0))
@@ -97,23 +102,26 @@ def czt(values: Any, count: int, step: float, first: float = 0.0, axis: int = -1
     first: the first of them, step: from each to the next, downwards; radians per sample.
     """
     array = samples(values, np.complex64, np.ndim(values))
-    return _along(array, axis, lambda image: _core.czt(image, count, step, first))
+    return _along(array, axis, lambda image: _core.czt(image, whole_number(count), float(step), float(first)))
 
 
 def resize(image: Any, shape: tuple[int, int]) -> np.ndarray:
     """An image of more lines and samples, by zero-padding of its spectrum, complex64."""
     array = samples(image, np.complex64, 2).copy()
-    longer = _core.grow(array, shape[0], array.shape[1])
-    return _core.grow(longer, *shape)
+    lines, places = map(whole_number, shape)
+    return _core.grow(_core.grow(array, lines, array.shape[1]), lines, places)
 
 
 def sample_at(image: Any, line: Any, sample: Any, lowpass: int = 1) -> np.ndarray:
     """An image between its samples, complex64: at places counted from 0, which are broadcast.
 
-    lowpass: from 1 to 64, narrows the band for places that are as far apart. Outside the image it is 0.
+    lowpass: from 1 to 64, narrows the band for places that are as far apart. Outside the image it is 0; at
+    places that are no numbers it is none.
     """
     lines, places = broadcast(line, sample)
-    return _core.sample_at(samples(image, np.complex64, 2), lines, places, lowpass)[()]
+    made = _core.sample_at(samples(image, np.complex64, 2), lines, places, whole_number(lowpass))
+    made[np.isnan(lines) | np.isnan(places)] = np.nan
+    return made[()]
 
 
 class Fit(NamedTuple):

@@ -18,6 +18,9 @@ from .times import to_datetime64
 __all__ = ["QuoBackend"]
 
 
+_BLOCK_LINES = 64  # whole, as they stand in the file
+
+
 class _LazyArray(BackendArray):
     """A two-dimensional array of which read() makes blocks; each key is an integer or a slice."""
 
@@ -89,12 +92,15 @@ def _image(product: Product, dtype: Any) -> Variable:
     raster = product.raster if dtype is None else product.raster.astype(dtype)
     unit = product["DataSetInfo/UnitType"] if "DataSetInfo" in product else ""
     lazy = indexing.LazilyIndexedArray(_Image(raster))
-    return Variable(("line", "sample"), lazy, {"units": unit} if unit else {})
+    lines, samples = raster.shape
+    variable = Variable(("line", "sample"), lazy, {"units": unit} if unit else {})
+    variable.encoding["preferred_chunks"] = {"line": max(1, min(lines, _BLOCK_LINES)), "sample": max(1, samples)}
+    return variable
 
 
 class QuoBackend(BackendEntrypoint):
     """Opens a product's header: the raster as the variable "image", read when it is asked for, with coordinates
-    line, sample, azimuth_time and slant_range_time, and all header fields as attributes, "Section/field"."""
+    line, sample, azimuth_time and slant_range_time, and all header fields as attributes, "Section.field"."""
 
     open_dataset_parameters = ("filename_or_obj", "drop_variables", "dtype")
 
@@ -105,8 +111,9 @@ class QuoBackend(BackendEntrypoint):
         image = _image(product, dtype)
         dropped = [drop_variables] if isinstance(drop_variables, str) else (drop_variables or ())
         coordinates = _coordinates(product, image.shape)
-        data = Dataset({"image": image}, coordinates, dict(product.walk()))
-        return data.drop_vars(dropped)
+        # Files of other formats have no names with slashes.
+        fields = {name.replace("/", "."): value for name, value in product.walk()}
+        return Dataset({"image": image}, coordinates, fields).drop_vars(dropped)
 
     def guess_can_open(self, filename_or_obj: Any) -> bool:
         """Other programs have files of that ending, too: only what is a product is one."""

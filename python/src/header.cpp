@@ -63,9 +63,9 @@ std::shared_ptr<Header> Header::read(const std::string& file) {
         if (const int status = header->all_.GSread(file.c_str())) return status;
         header->all_.GSdisable(gsDataFile);
         header->all_.GSdisable(gsOrbit);
-        header->grid_listed_ = header->grid_.readhdr(file.c_str()) == QUO_OK;
-        header->grid_known_ =
-            header->grid_listed_ || read_image_grid(file.c_str(), header->all_, header->grid_) == QUO_OK;
+        const int grid = header->grid_.readhdr(file.c_str());
+        header->grid_listed_ = grid == QUO_OK;
+        header->grid_broken_ = grid != QUO_OK && grid != QUO_REFUSED;
         return int{QUO_OK};
     });
     if (header->sections().empty()) raise(QUO_REFUSED, "the file holds no object of a product");
@@ -97,7 +97,7 @@ std::shared_ptr<Header> Header::clone() const {
 
 int Header::copy_to(Header& other) const {
     other.grid_listed_ = grid_listed_;
-    other.grid_known_ = grid_known_;
+    other.grid_broken_ = grid_broken_;
     // Copying takes nothing from the objects but what it copies; the library's signature does not say so.
     if (const int status = const_cast<GeneralSAR&>(all_).GSclone(&other.all_)) return status;
     return grid_.clone(&other.grid_);
@@ -173,6 +173,7 @@ std::optional<Record> Header::corner(const std::string& section) {
 int Header::remake_polynomials() {
     polySAR& set = all_.polynomials;
     const int counts[] = {set.ndc, set.nfr, set.nsl2gr, set.ngr2sl, set.nsl2theta, set.nsl2phi};
+    if (*std::min_element(std::begin(counts), std::end(counts)) < 0) return QUO_REFUSED;
     polySAR before;
     if (const int status = set.clone(&before)) return status;
     if (const int status = set.CreatePolys(counts[0], counts[1], counts[2], counts[3], counts[4], counts[5]))
@@ -185,7 +186,8 @@ int Header::remake_polynomials() {
 
 void Header::enable(const std::string& section, bool present) {
     if (section == grid_section()) {
-        grid_listed_ = grid_known_ = present;
+        grid_listed_ = present;
+        grid_broken_ = false;
         return;
     }
     const auto object = find(section);
@@ -216,8 +218,11 @@ void Header::set_orbit(const Orbit& orbit) {
 }
 
 Grid Header::grid() const {
-    if (!grid_known_) raise(QUO_REFUSED, "the product has no pixel grid");
-    return Grid{grid_};
+    if (grid_listed_) return Grid{grid_};
+    ImageGrid_Obj made;
+    if (grid_broken_ || attempt_locked([&] { return region_image_grid(all_, made); }).status != QUO_OK)
+        raise(QUO_REFUSED, "the product has no pixel grid");
+    return Grid{made};
 }
 
 std::shared_ptr<const polySAR> Header::polynomials() const {
@@ -279,6 +284,7 @@ void bind_header(py::module_& module) {
         .def("orbit", &Header::orbit)
         .def("set_orbit", &Header::set_orbit)
         .def("grid", &Header::grid)
+        .def_property("grid_broken", &Header::grid_broken, &Header::set_grid_broken)
         .def("evaluate", &evaluate, py::arg(), py::arg(), py::arg().noconvert(), py::arg().noconvert());
 }
 

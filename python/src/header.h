@@ -34,6 +34,8 @@ public:
     [[nodiscard]] Orbit orbit() const;
     void set_orbit(const Orbit& orbit);
     [[nodiscard]] Grid grid() const;
+    [[nodiscard]] bool grid_broken() const { return grid_broken_; }
+    void set_grid_broken(bool broken) { grid_broken_ = broken; }
     /** Polynomials as they are now, for evaluation without the interpreter's lock. */
     [[nodiscard]] std::shared_ptr<const polySAR> polynomials() const;
 
@@ -49,7 +51,7 @@ private:
     GeneralSAR all_;
     ImageGrid_Obj grid_;
     bool grid_listed_ = false;  // as a section of its own; else it is made of the region
-    bool grid_known_ = false;
+    bool grid_broken_ = false;  // listed, but no grid: the region must not stand for it
 };
 
 void bind_header(py::module_& module);

@@ -129,20 +129,17 @@ py::tuple to_radar(const Orbit& orbit, bool fixed, const Doubles& first, const D
     return py::make_tuple(azimuth_s, range_s, status);
 }
 
-/** Positions or velocities, three values for each time; not-a-number where the time is no number. */
-Doubles along(const Orbit& orbit, int (GeneralSAROrbit::*vector)(double, double*) noexcept,
-              const Doubles& times_s) {
+enum class Vector : std::uint8_t { kPosition, kVelocity };
+
+/** Three values for each time; not-a-number where the time is no number. */
+Doubles along(const Orbit& orbit, Vector which, const Doubles& times_s) {
     std::vector<py::ssize_t> shape = shape_of(times_s);
     shape.push_back(3);
     Doubles vectors{shape};
-    const double* const times = times_s.data();
     double* const to = vectors.mutable_data();
-    const auto model = orbit.own_model();
-    run("following an orbit", [&, count = times_s.size()] {
-        for (py::ssize_t i = 0; i < count; ++i)
-            if (((*model).*vector)(times[i], to + 3 * i) != QUO_OK)
-                std::fill_n(to + 3 * i, 3, std::numeric_limits<double>::quiet_NaN());
-        return int{QUO_OK};
+    run("following an orbit", [&, count = static_cast<std::size_t>(times_s.size()), times = times_s.data()] {
+        const bool position = which == Vector::kPosition;
+        return orbit.model().SVGetStates(count, times, position ? to : nullptr, position ? nullptr : to);
     });
     return vectors;
 }
@@ -183,12 +180,10 @@ void bind_orbit(py::module_& module) {
         .def("to_radar", &to_radar, py::arg(), array, array, array, array)
         .def(
             "positions_at",
-            [](const Orbit& self, const Doubles& times) { return along(self, &GeneralSAROrbit::SVGetPos, times); },
-            array)
+            [](const Orbit& self, const Doubles& times) { return along(self, Vector::kPosition, times); }, array)
         .def(
             "velocities_at",
-            [](const Orbit& self, const Doubles& times) { return along(self, &GeneralSAROrbit::SVGetVel, times); },
-            array)
+            [](const Orbit& self, const Doubles& times) { return along(self, Vector::kVelocity, times); }, array)
         .def_property_readonly("first_time", [](const Orbit& self) { return self.vectors().first_s; })
         .def_property_readonly("spacing", [](const Orbit& self) { return self.vectors().spacing_s; })
         .def_property_readonly("positions",

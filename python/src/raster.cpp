@@ -26,7 +26,8 @@ struct Block {
 class Reader {
 public:
     /** The raster that `header` describes or, where `raster` is given, the one of that name. */
-    Reader(const std::string& header, const std::optional<std::string>& raster) {
+    Reader(const std::string& header, const std::optional<std::string>& raster)
+        : reading_{"reading " + raster.value_or(header.substr(0, std::max(header.size(), kSuffix) - kSuffix))} {
         run("opening a raster", [&] {
             if (const int status = quo_product_open(header.c_str(), raster ? raster->c_str() : nullptr, &product_))
                 return status;
@@ -49,13 +50,15 @@ public:
             throw py::value_error("a writable C-contiguous array is needed");
         void* const bytes = to.mutable_data();
         const auto room = static_cast<std::size_t>(to.nbytes());
-        run("reading a raster", [&] {
+        run(reading_.c_str(), [&] {
             return quo_product_read(product_, block.first_line, block.lines, block.first_sample, block.samples,
                                     cell_type, bytes, room);
         });
     }
 
 private:
+    static constexpr std::size_t kSuffix = 4;  // of a header's name beside its raster's
+    std::string reading_;
     quo_product* product_ = nullptr;
     int32_t lines_ = 0, samples_ = 0, cell_type_ = CELL_NOT_SET;
 };

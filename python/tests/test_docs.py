@@ -1,4 +1,5 @@
 import re
+import sys
 from pathlib import Path
 
 import numpy as np
@@ -40,9 +41,22 @@ def test_the_page_of_names_is_that_of_the_package(monkeypatch):
     assert (ROOT / "docs" / "python_names.md").read_text() == python_names.page()
 
 
+def draw_a_map_of_islands(scene_map, folder):
+    import elevation_model
+    import make_map
+
+    rows = ["name,latitude_deg,longitude_deg,height_m"]
+    rows += [f"{i}{j},{scene_map.y.values[i]},{scene_map.x.values[j]},30" for i in (60, 150, 240) for j in (60, 150, 240)]
+    (folder / "places.csv").write_text("\n".join(rows))
+    elevation_model.main("places.csv", "islands.tif")
+    make_map.main("scene.hdr", "islands.tif", "places.csv", "islands.png")
+    assert (folder / "islands.png").stat().st_size > 1e4
+
+
 def test_the_examples_of_the_page_run(scene_file, tmp_path, monkeypatch, capsys):
     rasterio = pytest.importorskip("rasterio")
-    for module in ("pyproj", "matplotlib", "distributed"):
+    distributed = pytest.importorskip("distributed")
+    for module in ("pyproj", "matplotlib"):
         pytest.importorskip(module)
     monkeypatch.chdir(tmp_path)
     samples = make_scene(scene_file)
@@ -69,5 +83,12 @@ def test_the_examples_of_the_page_run(scene_file, tmp_path, monkeypatch, capsys)
     told = capsys.readouterr().out
     assert told.count("incidence") == 5 and f"{LINES} lines, mean power {np.mean(np.abs(samples) ** 2):.4g}"[:-1] in told
     maps_on_workers.make_map("map.tif", "scene.hdr", "dem.tif")
+    monkeypatch.setattr("sys.argv", ["", "dem.tif", ".", "scene.hdr", "--scheduler"])
+    with distributed.LocalCluster(n_workers=1, processes=False, dashboard_address=None) as cluster:
+        sys.argv.append(cluster.scheduler_address)
+        assert maps_on_workers.main() == 0
+    assert (tmp_path / "scene.tif").read_bytes() == (tmp_path / "map.tif").read_bytes()
+    draw_a_map_of_islands(names["scene_map"], tmp_path)
+    assert "9 places; the brightest" in capsys.readouterr().out
     with rasterio.open("map.tif") as file:
         assert np.array_equal(file.read(1), names["scene_map"].image, equal_nan=True)

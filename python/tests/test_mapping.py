@@ -3,14 +3,18 @@
 import os
 import pickle
 import re
+import subprocess
 import sys
+import time
 import tracemalloc
+from functools import partial
 
 import numpy as np
 import pytest
 import quo_base
 from conftest import DATA, SCENES, copy_of_safe, write_model
 from quo_base import Job, Product, geocode, run, sentinel1
+from quo_base import jobs as jobs_module
 
 rasterio = pytest.importorskip("rasterio")
 pyproj = pytest.importorskip("pyproj")
@@ -18,9 +22,13 @@ pytest.importorskip("xarray")
 LINES, SAMPLES = 600, 2000
 
 
+def stripes(latitude, longitude):
+    return 1.0 + 0.5 * np.cos(2 * np.pi * 120 * latitude) + 0.5 * np.cos(2 * np.pi * 150 * longitude)
+
+
 @pytest.fixture(scope="module")
 def product(tmp_path_factory):
-    """A part of a real scene whose amplitudes are large near whole minutes of latitude."""
+    """A part of a real scene whose amplitudes are large near half minutes of latitude and near some of longitude."""
     path = str(tmp_path_factory.mktemp("map") / "image")
     scene = Product(DATA / "scenes" / (SCENES[0] + ".xml"))
     made = scene.clone()
@@ -30,7 +38,7 @@ def product(tmp_path_factory):
     line, sample = np.meshgrid(np.arange(LINES), np.arange(SAMPLES), indexing="ij")
     seen = made.orbit.to_ground(1167930362.0 + 2.0555e-3 * line, 0.0055 + 1.5541e-8 * sample)
     with quo_base.RasterWriter(path, (LINES, SAMPLES), np.float32) as writer:
-        writer[:] = 1.0 + np.cos(2 * np.pi * 120 * seen.latitude)
+        writer[:] = stripes(seen.latitude, seen.longitude)
     made.save(path + ".hdr", exact=True)
     return Product(path + ".hdr")
 
@@ -45,11 +53,10 @@ def flat(product, tmp_path):
 
 
 @pytest.mark.parametrize("resampling, most", [("nearest", 0.15), ("bilinear", 0.02), ("sinc", 0.003)])
-def test_what_depends_on_latitude_alone_is_the_same_along_every_row(product, flat, resampling, most):
+def test_stripes_of_latitude_and_longitude_are_where_they_belong(product, flat, resampling, most):
     made = geocode(product, flat, resampling=resampling, heights="ellipsoid")
-    expected = 1.0 + np.cos(2 * np.pi * 120 * made.y.values)
     assert made.image.shape == (60, 400)
-    assert np.nanmax(np.abs(made.image.values - expected[:, np.newaxis])) < most
+    assert np.nanmax(np.abs(made.image.values - stripes(made.y.values[:, np.newaxis], made.x.values))) < most
 
 
 def test_tiles_are_the_whole_on_any_scheduler_and_travel_small(product, flat):
@@ -59,6 +66,11 @@ def test_tiles_are_the_whole_on_any_scheduler_and_travel_small(product, flat):
     for name, values in tiles.compute(scheduler="threads").items():
         np.testing.assert_array_equal(values, whole[name])
     assert not whole["mask"].any()
+    with rasterio.open(flat, "r+") as file:
+        file.write(200 * np.random.default_rng(4).random((60, 400), "f4"), 1)
+    rough = [geocode(product, flat, chunks=chunks, **wanted).compute(scheduler="threads") for chunks in (None, 25)]
+    for name in wanted["quantities"]:
+        np.testing.assert_array_equal(*(each[name] for each in rough), err_msg=name)
     inner = (slice(2, -2), slice(2, -2))  # on flat ground the terrain's normal is the ellipsoid's
     np.testing.assert_allclose(whole.local_incidence[inner], whole.incidence[inner], atol=0.02)
 
@@ -73,6 +85,8 @@ def test_a_ridge_hides_and_overlays_what_its_geometry_says(product, tmp_path):
     heights = np.repeat(np.maximum(0.0, 300.0 - 3.0 * x)[np.newaxis], 40, axis=0)
     path = write_model(tmp_path / "ridge.tif", heights, (east - 1000, north + 200), 10.0, crs)
     made = geocode(product, path, quantities=["mask", "incidence"], heights="ellipsoid")
+    tiles = geocode(product, path, quantities=["mask"], heights="ellipsoid", chunks=16).compute()
+    np.testing.assert_array_equal(tiles["mask"], made["mask"])  # what lies outside a tile is seen from it
     row = made["mask"].values[20]
     angle = np.radians(float(made.incidence[20, 100]))
     x, y, z = product.orbit.velocity(times.azimuth_time)
@@ -94,7 +108,7 @@ def test_heights_of_a_geoid_are_converted_or_refused_and_never_mixed(product, fl
     with pytest.raises(ValueError, match="no place in common"):
         far = write_model(tmp_path / "far.tif", np.zeros((9, 9)), (150.0, 10.0), 1e-3)
         geocode(product, far, heights="ellipsoid")
-    for wrong in ({"resampling": "cubic"}, {"quantities": []}, {"quantities": ["height", "slope"]}, {"heights": "sea"}, {"spacing": -1.0}, {"chunks": 0}):
+    for wrong in ({"spacing": 1e-9}, {"spacing": 1e9}, {"crs": "EPSG:4978"}, {"resampling": "cubic"}, {"quantities": []}, {"quantities": ["height", "slope"]}, {"heights": "sea"}, {"spacing": -1.0}, {"chunks": 0}):
         with pytest.raises(ValueError):
             geocode(product, flat, **{"heights": "ellipsoid", **wrong})
     with pytest.MonkeyPatch.context() as absent, pytest.raises(ModuleNotFoundError, match="python3-pyproj"):
@@ -106,6 +120,72 @@ def test_heights_of_a_geoid_are_converted_or_refused_and_never_mixed(product, fl
         geocode(product, flat, heights="ellipsoid")
 
 
+def test_heights_are_what_their_file_means(product, flat, tmp_path):
+    with rasterio.open(flat, "r+") as file:
+        file.write(np.full((60, 400), 50, "f4"), 1)
+        file.scales, file.offsets = (2.0,), (5.0,)
+        mask = np.full((60, 400), 255, "u1")
+        mask[30, 200] = 0
+        file.write_mask(mask)
+    made = geocode(product, flat, heights="ellipsoid", quantities=["height", "mask"])
+    assert np.isnan(made.height[30, 200]) and made["mask"][30, 200] == 4 and not made["mask"][:, :100].any()
+    np.testing.assert_allclose(made.height[:, :100], 105.0, rtol=1e-12)
+    solid = write_model(tmp_path / "solid.tif", np.zeros((60, 400)), rasterio.open(flat).transform[2:6:3], 1e-4, "EPSG:4979")
+    assert not geocode(product, solid, quantities=["height"]).height.any()
+    with pytest.raises(ValueError, match="ellipsoid"):
+        geocode(product, solid, heights="egm96")
+    with rasterio.open(flat, "r+") as file:
+        file.units = ("foot",)
+    with pytest.raises(ValueError, match="metres"):
+        geocode(product, flat, heights="ellipsoid")
+
+
+@pytest.mark.parametrize("width, turn", [(400, 0.0), (400, 360.0), (3600, 0.0)])
+def test_a_map_goes_on_beyond_the_antimeridian(product, flat, tmp_path, width, turn):
+    """Turned about the Earth's axis, image and model are the same elsewhere."""
+    whole = geocode(product, flat, heights="ellipsoid")
+    a, _, west, _, _, north = rasterio.open(flat).transform[:6]
+    delta = 180.0 - west - 200.5 * a
+    turned, c, s = product.clone(), np.cos(np.radians(delta)), np.sin(np.radians(delta))
+    vectors, matrix = product.orbit, np.array([[c, -s, 0], [s, c, 0], [0, 0, 1]])
+    turned.orbit = quo_base.Orbit(vectors.first_time, vectors.spacing, vectors.positions @ matrix.T, vectors.velocities @ matrix.T)
+    turned.save(tmp_path / "turned.hdr", exact=True)
+    turned = Product(tmp_path / "turned.hdr", raster=product.path[:-4])
+    if width == 400:
+        path = write_model(tmp_path / "there.tif", np.zeros((60, 400)), (west + delta - turn, north), a)
+        made = geocode(turned, path, heights="ellipsoid")
+        np.testing.assert_allclose(made.image, whole.image, atol=1e-4)
+    else:
+        path = write_model(tmp_path / "round.tif", np.zeros((1800, 3600)), (-180.0, 90.0), 0.1)
+        made = geocode(turned, path, spacing=a, heights="ellipsoid", chunks=400)
+        x, y = whole.x.values + delta, whole.y.values
+        near = made.image.sel(x=x[5:-5], y=y[5:-5], method="nearest")
+        assert made.x.size < 4000 and np.isfinite(near).all()
+
+
+def check_real_terrain(product):
+    """A map over measured heights: against the array calls at heights taken pixel by pixel, and against
+    the one tie point that lies there, from which its terrain differs by metres."""
+    path = DATA / "sentinel1" / "dem" / "rome_30m.tif"
+    made = geocode(product, path, quantities=["line", "sample", "height"])
+    with rasterio.open(path) as file:
+        row, column = np.random.default_rng(2).integers(0, 120, (2, 50))
+        longitude, latitude = (np.array(each) for each in file.xy(row, column))
+        above_sea = file.read(1)[row, column].astype(float)
+    geoid = pyproj.Transformer.from_crs("EPSG:4326+5773", "EPSG:4979", always_xy=True)
+    height = geoid.transform(longitude, latitude, above_sea)[2]
+    seen = product.orbit.to_radar(latitude, longitude, height)
+    there = product.grid.pixels(*seen[:2])
+    assert made.height.shape == (120, 120) and np.ptp(height) > 20
+    for name, expected, most in (("height", height, 1e-4), ("line", there.line, 1e-3), ("sample", there.sample, 1e-3)):
+        np.testing.assert_allclose(made[name].values[row, column], expected, rtol=0, atol=most)
+    line, sample, latitude, longitude, height, incidence = 8020, 22202, 42.00620382, 12.49345628, 93.9934, 44.0716
+    here = made.interp(x=longitude, y=latitude)
+    nearer = (float(here.height) - height) / np.tan(np.radians(incidence)) / 10.0  # samples of 10 m
+    assert abs(float(here.height) - height) < 15
+    assert (float(here["line"]), float(here["sample"]) + nearer) == pytest.approx((line, sample), abs=0.1)
+
+
 def test_tie_points_of_a_real_ground_range_image_lie_on_their_pixels(tmp_path):
     """On slopes that go through each tie point's height: what its producer states, from the whole chain of the map."""
     name = "S1B_IW_GRDH_1SDV_20211223T051122_20211223T051147_030148_039993_5371.SAFE"
@@ -113,6 +193,7 @@ def test_tie_points_of_a_real_ground_range_image_lie_on_their_pixels(tmp_path):
     product = sentinel1.import_product(folder, tmp_path / "image").product
     product.RasterInfo.NrOfPixelsPerLine = 26102  # no samples are read
     product.save(exact=True)
+    check_real_terrain(product)
     tags = ("line", "pixel", "latitude", "longitude", "height")
     stated = np.array([re.findall(f"<{tag}>([0-9.e+-]+)</{tag}>", annotation)[-20:] for tag in tags], float).T
     slope = np.add.outer(np.arange(-4, 5), 2 * np.arange(-4, 5))
@@ -136,11 +217,23 @@ def test_memory_is_that_of_a_tile_not_of_the_map(product, flat):
     assert peak(50) < 0.4 * peak(400)
 
 
-def test_files_and_clusters_that_go_are_told(product, flat, tmp_path):
+def test_files_and_clusters_that_go_are_told(product, flat, tmp_path, monkeypatch):
     copy = str(tmp_path / "copy.hdr")
     Product(product.path).save(copy)
     tiles = geocode(Product(copy, raster=product.path[:-4]), flat, heights="ellipsoid", chunks=64)
     assert tiles.image.mean().compute(scheduler="synchronous") == pytest.approx(1, abs=0.5)
+    monkeypatch.chdir(tmp_path)
+    changed = Product("copy.hdr", raster=product.path[:-4])
+    there = geocode(changed, "flat.tif", heights="ellipsoid", chunks="auto").image  # names without a folder
+    assert there.data.npartitions == 1 and there.data.name != tiles.image.data.name
+    monkeypatch.chdir("/")
+    np.testing.assert_array_equal(there.compute(scheduler="synchronous"), tiles.image.compute(scheduler="synchronous"))
+    monkeypatch.chdir(tmp_path)
+    os.utime(flat, (1, 1))  # a model that has changed makes other tiles
+    assert geocode(changed, flat, heights="ellipsoid", chunks=64).image.data.name != tiles.image.data.name
+    changed.SamplingConstants.prf_hz *= 1.001
+    with pytest.raises(ValueError, match="save"):
+        geocode(changed, flat, heights="ellipsoid")
     os.remove(flat)
     with pytest.raises(rasterio.errors.RasterioIOError, match="flat.tif"):
         tiles.compute(scheduler="synchronous")
@@ -163,6 +256,11 @@ def _write(path, text, fail_once=None):
         raise OSError("once")
 
 
+def _slowly(path, text):
+    time.sleep(0.01)
+    _write(path, text)
+
+
 def _kill_once(path, mark):
     _write(path, "half")
     if not os.path.exists(mark):
@@ -171,16 +269,54 @@ def _kill_once(path, mark):
     _write(path, "whole")
 
 
+def _kill_once_within(tile, mark):
+    if not os.path.exists(mark):
+        open(mark, "w").close()
+        os._exit(1)
+    return tile
+
+
 def test_outputs_appear_whole_or_not_at_all(tmp_path):
     jobs = [Job(str(tmp_path / str(i)), _write, (str(i),)) for i in range(5)]
     jobs.append(Job(str(tmp_path / "again"), _write, ("again", str(tmp_path / "mark"))))
     jobs.append(Job(str(tmp_path / "never"), _write, ()))
+    jobs.append(Job(str(tmp_path / "ends"), sys.exit))
+    jobs.append(Job(str(tmp_path / "nothing"), partial(max, "a")))
     outcomes = run(jobs, progress=None)
-    assert [outcome.state for outcome in outcomes] == ["made"] * 6 + ["failed"] and "TypeError" in outcomes[-1].reason
+    assert [outcome.state for outcome in outcomes] == ["made"] * 6 + ["failed"] * 3
+    for outcome, reason in zip(outcomes[6:], ("TypeError", "SystemExit", "has made nothing")):
+        assert reason in outcome.reason
     assert sorted(os.listdir(tmp_path)) == ["0", "1", "2", "3", "4", "again", "mark"]
     assert [outcome.state for outcome in run(jobs[:6], progress=None)] == ["skipped"] * 6
     with pytest.raises(ValueError):
-        run(jobs[:1] * 2)
+        run([jobs[0], jobs[0]._replace(output=str(tmp_path / "x" / ".." / "0"))])
+
+
+def test_only_what_this_run_or_a_dead_one_has_begun_is_swept(tmp_path):
+    host, mine = jobs_module._host(), f"{os.getpid():08x}"
+    dead = subprocess.Popen(["true"])
+    dead.wait()
+    out = str(tmp_path / "out")
+    stay = [".part-1", ".part-" + "g" * 32, f".part-{host}{mine}{0:016x}", f".part-{'0' * 8}{dead.pid:08x}{0:016x}"]
+    output_too = f".part-{host}{dead.pid:08x}{1:016x}"
+    for tail in (*stay, output_too, f".part-{host}{dead.pid:08x}{0:016x}"):
+        _write(out + tail, "")
+    jobs = [Job(out, _write, ("text",)), Job(out + output_too, _write, ("text",))]
+    assert [outcome.state for outcome in run(jobs, progress=None)] == ["made", "skipped"]
+    assert sorted(os.listdir(tmp_path)) == sorted("out" + tail for tail in ("", output_too, *stay))
+
+
+def test_what_progress_raises_ends_the_run(tmp_path):
+    def stop(*_):
+        raise KeyboardInterrupt
+
+    jobs = [Job(str(tmp_path / str(i)), _slowly, ("",)) for i in range(200)]
+    with pytest.raises(KeyboardInterrupt) as raised:
+        run(jobs, progress=stop)
+    made = os.listdir(tmp_path)
+    assert 0 < len(made) < 200
+    time.sleep(0.1)
+    assert os.listdir(tmp_path) == made and raised.tb  # which holds all that ran
 
 
 def test_a_killed_worker_leaves_nothing_half(tmp_path, product, flat):
@@ -191,7 +327,9 @@ def test_a_killed_worker_leaves_nothing_half(tmp_path, product, flat):
     with distributed.LocalCluster(n_workers=2, threads_per_worker=1, dashboard_address=None) as cluster:
         with distributed.Client(cluster) as client:
             assert all(outcome.state != "failed" for outcome in run(jobs, client, progress=None))
-            tiles = geocode(product, flat, heights="ellipsoid", chunks=100).image.compute()
-    assert (tmp_path / "killed").read_text() == "whole"
+            tiles = geocode(product, flat, heights="ellipsoid", chunks=100).image
+            mark = str(tmp_path / "again")
+            tiles = tiles.data.map_blocks(_kill_once_within, mark, dtype=tiles.dtype, meta=np.empty((0, 0), "f4")).compute()
+    assert os.path.exists(mark) and (tmp_path / "killed").read_text() == "whole"
     assert not [name for name in os.listdir(tmp_path) if ".part-" in name]
-    np.testing.assert_array_equal(tiles.values, whole)
+    np.testing.assert_array_equal(tiles, whole)

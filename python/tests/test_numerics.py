@@ -29,6 +29,7 @@ def test_images_are_transformed_along_either_axis_and_both():
     tone = np.exp(2j * np.pi * 0.0625 * np.arange(64))[None, :] * np.ones((64, 1))
     finer = signal.resize(tone, (64, 128))
     np.testing.assert_allclose(finer[5], np.exp(2j * np.pi * 0.03125 * np.arange(128)), atol=1e-5)
+    assert np.isnan(signal.sample_at(tone, [31.0, np.nan], 30.25)).tolist() == [False, True]
     np.testing.assert_allclose(signal.sample_at(tone, 31.0, 30.25), np.exp(2j * np.pi * 0.0625 * 30.25), atol=1e-4)
 
 
@@ -43,11 +44,34 @@ def test_certified_fits_are_met():
 
 
 @pytest.mark.parametrize(
+    "doing",
+    [
+        lambda: Region()[3],
+        lambda: Configuration(3),
+        lambda: Region().update({1: 2}),
+        lambda: Region.read("x", 3),
+        lambda: ParameterFile("x")["a", 1],
+        lambda: Coregistration().with_samples(1, 2),
+    ],
+)
+def test_wrong_types_are_told_in_the_words_of_the_package(doing):
+    with pytest.raises(TypeError) as caught:
+        doing()
+    assert "_core" not in str(caught.value) and "self:" not in str(caught.value)
+
+
+@pytest.mark.parametrize(
     "refused, doing",
     [
         (Refused, lambda: signal.fft(np.zeros((0, 4)))),
         (TypeError, lambda: signal.fft(["one"])),
         (ValueError, lambda: signal.irfft(np.zeros(4), 9)),
+        (ValueError, lambda: signal.irfft(np.zeros(1), 0)),
+        (ValueError, lambda: signal.fast_length(2**31 - 1)),
+        (ValueError, lambda: Region.of_axes((0.005, 1e-8, 9), (1e9, 0.002, 9)).samples([np.nan])),
+        (ValueError, lambda: Region.of_axes((0.005, 1e-8, 9), (1e9, 0.002, 9)) & Region.of_axes((0.006, 1e-8, 9), (1e9, 0.002, 9))),
+        (ValueError, lambda: ParameterFile("x").__setitem__(("A", "B"), "one\n[C]")),
+        (ValueError, lambda: ParameterFile("x").__setitem__(("A", "B\0"), 1)),
         (ValueError, lambda: signal.resize(np.zeros((4, 4)), (2, 8))),
         (ValueError, lambda: signal.czt(np.zeros(4), 0, 1.0)),
         (ValueError, lambda: signal.least_squares(np.eye(3), np.ones(2))),

@@ -73,6 +73,8 @@ def test_positions_follow_the_vectors_and_velocities_their_slope(scene_file):
     middle = orbit.first_time + 70.3
     slope = (orbit.position(middle + 0.5) - orbit.position(middle - 0.5)) / 1.0
     np.testing.assert_allclose(orbit.velocity(middle), slope, rtol=0, atol=1e-3)
+    times_of_a_line = middle - np.arange(40) * 1.7  # what stands beside a time does not choose its curve
+    assert np.array_equal(orbit.position(times_of_a_line), [orbit.position(each) for each in times_of_a_line])
     finer = orbit.resample(3.0)
     assert finer.spacing <= 3.0 and len(orbit) == 16
     np.testing.assert_allclose(finer.position(middle), orbit.position(middle), rtol=0, atol=1e-3)
@@ -90,6 +92,13 @@ def test_times_are_those_of_the_calendar():
     assert times.to_seconds("04-JAN-2022 17:05:58.268589") == times.to_seconds("2022-01-04T17:05:58.268589Z")
     assert times.to_text(seconds[1]) == "2022-01-04T17:05:58.268589"
     assert np.isnat(times.to_datetime64([1e10, -1e10, np.inf])).all()  # no wrap into other centuries
+    far = np.array(["2500-01-01", "1984-12-31", "NaT"], "datetime64[D]")  # which nanoseconds do not reach
+    np.testing.assert_array_equal(times.to_seconds(far), [188100 * 86400.0, -86400.0, np.nan])
+    assert times.to_seconds("2022-01-04") == 1167868800.0
+    masked = times.to_seconds(np.ma.array(stamps, mask=[True, False, False]))
+    assert np.isnan(masked).tolist() == [True, False, True] and masked[1] == seconds[1]
+    with pytest.raises(ValueError, match="100,000"):
+        times.to_seconds(np.datetime64(9 * 10**18, "s"))
     for text in ("yesterday", "32-JAN-2022"):
         with pytest.raises(ValueError):
             times.to_seconds(text)

@@ -21,10 +21,38 @@ def test_copies_have_the_same_content_and_a_life_of_their_own(scene_file, tmp_pa
     product.DataSetInfo.Description = "<né>"
     product.save(tmp_path / "copy.hdr", exact=True)
     for copy in (Product(tmp_path / "copy.hdr"), product.clone(), pickle.loads(pickle.dumps(product))):
-        assert copy == product
+        assert copy == product and copy.grid.times(7, 9) == product.grid.times(7, 9)
         copy.DataSetInfo.SceneID = "other"
         assert copy != product
     assert product.evaluate("DC", [0.0055, 0.0065], 1e9).tolist() == [1.5, 1.5 + 2 * (0.0065 - 0.0055) ** 2]
+
+
+def test_the_grid_is_that_of_the_sections_as_they_are(scene_file, tmp_path):
+    product = Product(scene_file)
+    before = product.grid.times(0, 0)
+    product.ROI.SlowStartTime += 0.25
+    assert product.grid.times(0, 0).azimuth_time == before.azimuth_time + 0.25
+    product.add("ImageGrid", Epoch_s=1.1e9, FirstLine_s=0.5, LineStep_s=0.002, FirstSample_s=0.005, SampleStep_s=1e-8)
+    assert product.grid.times(0, 0)[:2] == (1.1e9 + 0.5, 0.005)
+    product.save(tmp_path / "broken.hdr")  # a grid that is none is not the region's
+    text = (tmp_path / "broken.hdr").read_text()
+    (tmp_path / "broken.hdr").write_text(text.replace("SampleStep_s", "Step_s"))
+    for broken in (Product(tmp_path / "broken.hdr"), pickle.loads(pickle.dumps(Product(tmp_path / "broken.hdr")))):
+        with pytest.raises(Refused, match="no pixel grid"):
+            broken.grid
+    del product["ImageGrid"], product["ROI"]
+    with pytest.raises(Refused, match="no pixel grid"):
+        pickle.loads(pickle.dumps(product)).grid
+
+
+def test_sections_travel_and_tell_that_they_are_gone(scene_file):
+    product = Product(scene_file)
+    product.add("PolySAR", ndc=2)
+    for section in (product.ROI, product["PolySAR/DopplerCentroid-1"]):
+        assert pickle.loads(pickle.dumps(section)) == section
+    section = product.ROI
+    del product["ROI"]
+    assert "no more" in repr(section)
 
 
 def test_lengths_and_arrays_stay_together(scene_file):
@@ -61,6 +89,9 @@ def test_counts_of_polynomials_keep_those_that_stay(scene_file):
     assert first.pol.tolist() == list(range(7)) and "PolySAR/DopplerCentroid-2" in product
     with pytest.raises(KeyError):
         rate["pol"]
+    with pytest.raises(Refused):
+        product.PolySAR.ndc = -1
+    assert product.PolySAR.ndc == 3 and first.pol.tolist() == list(range(7))
 
 
 @pytest.mark.parametrize(

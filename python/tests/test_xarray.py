@@ -25,7 +25,7 @@ def made(folder, **grid):
 def test_a_product_is_a_data_set(tmp_path, chunks):
     samples, file = made(tmp_path)
     data = pickle.loads(pickle.dumps(xarray.open_dataset(file, engine="quo_base", chunks=chunks)))
-    assert data.image.dims == ("line", "sample") and data.attrs["SamplingConstants/prf_hz"] == 1717.25
+    assert data.image.dims == ("line", "sample") and data.attrs["SamplingConstants.prf_hz"] == 1717.25
     keys = [dict(line=3), dict(line=slice(8, 2, -2), sample=slice(1, None, 3)), dict(line=[7, 2], sample=[0, 9])]
     for key in keys:
         plain = xarray.DataArray(samples, dims=("line", "sample")).isel(key)
@@ -51,11 +51,18 @@ def test_times_that_change_along_both_axes_are_made_when_asked_for(tmp_path):
     np.testing.assert_allclose(pixels.line, np.repeat(np.arange(12.0)[:, None], 10, 1), atol=2e-4)
 
 
-def test_arguments_of_the_engine(tmp_path):
+def test_arguments_of_the_engine(tmp_path, monkeypatch):
     samples, file = made(tmp_path)
     data = xarray.open_dataset(file, drop_variables="azimuth_time", dtype="f8", engine="quo_base")
     assert data.image.dtype == np.float64 and "azimuth_time" not in data.coords
     assert np.array_equal(xarray.open_dataset(file).image, samples)
+    monkeypatch.setattr("quo_base.xarray_engine._BLOCK_LINES", 3)
+    data = xarray.open_dataset(file, chunks={})
+    assert data.image.chunks == ((3, 3, 3, 3), (10,))  # whole lines
+    pytest.importorskip("scipy")
+    data.to_netcdf(tmp_path / "image.nc", engine="scipy")
+    with xarray.open_dataset(tmp_path / "image.nc", engine="scipy") as copy:
+        assert copy.image.equals(data.image) and copy.attrs["SamplingConstants.prf_hz"] == 1717.25
     (tmp_path / "other.hdr").write_text("ENVI\n")
     with pytest.raises(ValueError):
         xarray.open_dataset(tmp_path / "other.hdr")

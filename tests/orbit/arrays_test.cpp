@@ -272,6 +272,33 @@ TEST(Arrays, RefuseWhatDoesNotFitAndWriteNothing) {
     expect(QUO_REFUSED, inverse, [&](auto&, auto& out) { out.azimuth_s = x + 1; });
 }
 
+// Two runs serve most times; which one it is must not hang on the times beside, nor on what was asked before.
+TEST(Arrays, FollowThePlatformAsATimeAloneDoes) {
+    test::Flight flight{kTimes};
+    GeneralSAROrbit &orbit = flight.orbit, empty;
+    std::vector<double> times{kTimes.last(), kNaN, kTimes.first_s - 17.3}, positions(90, 2.5), velocities(90, 2.5);
+    for (int i = 0; i < 27; ++i) times.push_back(kTimes.first_s + 0.37 * kTimes.spacing_s * i);
+    ASSERT_EQ(orbit.SVGetStates(30, times.data(), positions.data(), nullptr), QUO_OK);
+    ASSERT_EQ(orbit.SVGetStates(30, times.data(), nullptr, velocities.data()), QUO_OK);
+    for (std::size_t i = 0; i < times.size(); ++i) {
+        double alone[6] = {kNaN, kNaN, kNaN, kNaN, kNaN, kNaN};
+        ASSERT_EQ(orbit.updatePolys(kTimes.last()), 0);
+        const int expected = std::isfinite(times[i]) ? QUO_OK : QUO_REFUSED;
+        ASSERT_EQ(orbit.SVGetPos(times[i], alone), expected);
+        ASSERT_EQ(orbit.SVGetVel(times[i], alone + 3), expected);
+        EXPECT_TRUE(std::equal(alone, alone + 3, &positions[3 * i], same)) << i;
+        EXPECT_TRUE(std::equal(alone + 3, alone + 6, &velocities[3 * i], same)) << i;
+    }
+    double* const at = positions.data();
+    const double first = *at;
+    EXPECT_EQ(empty.SVGetStates(1, times.data(), at, nullptr), QUO_REFUSED);
+    EXPECT_EQ(orbit.SVGetStates(1, nullptr, at, nullptr), QUO_REFUSED);
+    EXPECT_EQ(orbit.SVGetStates(SIZE_MAX / 24, times.data(), at, nullptr), QUO_REFUSED);
+    EXPECT_EQ(orbit.SVGetStates(2, times.data(), at, at + 5), QUO_REFUSED);
+    EXPECT_EQ(orbit.SVGetStates(2, at + 5, at, nullptr), QUO_REFUSED);
+    EXPECT_EQ(*at, first);
+}
+
 // Places are the points that from_geodetic() makes of them; a Doppler or height that is not given is 0.
 TEST(Arrays, TakePlacesAndDoWithoutWhatIsNotGiven) {
     test::Flight flight{kTimes};

@@ -104,8 +104,14 @@ const RasterDescription* described_raster(const GeneralSAR& product) noexcept {
 
 int read_image_grid(const char* header, const GeneralSAR& product, ImageGrid_Obj& grid) noexcept {
     quo::CallFrame frame{"read_image_grid", kSource};
-    const int status = grid.readhdr(header);
-    if (status != QUO_REFUSED) return status == QUO_OK ? frame.success() : frame.callee(status);
+    int status = grid.readhdr(header);
+    if (status == QUO_REFUSED) status = region_image_grid(product, grid);
+    if (status == QUO_REFUSED) return frame.silent(QUO_REFUSED);
+    return status == QUO_OK ? frame.success() : frame.callee(status);
+}
+
+int region_image_grid(const GeneralSAR& product, ImageGrid_Obj& grid) noexcept {
+    quo::CallFrame frame{"region_image_grid", kSource};
     const RasterDescription* const raster = described_raster(product);
     const ROI_Obj& region = product.roi.Roi;
     const bool fits = raster == nullptr || raster->NrOfLinesPerImage == 0 ||

@@ -23,6 +23,7 @@ constexpr const char* kSource = "generalSARorbit";
 constexpr const char* kNoModel = "There are no state vectors, or no model through them";
 constexpr const char* kForward = "GeneralSAROrbit::sat2earth";
 constexpr const char* kInverse = "GeneralSAROrbit::earth2sat";
+constexpr const char* kStates = "GeneralSAROrbit::SVGetStates";
 constexpr const char* kMissing = "An array is missing, or points are given twice";
 constexpr const char* kBadArrays = "Arrays overlap, or no memory can hold them";
 constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
@@ -73,6 +74,17 @@ void solve_rest(const Piece& piece, bool all_solved, const std::int64_t* solved,
         for (int i = 0; i < piece.count; ++i)
             if (solved[i] == 0) status[i] = solve(i);
     piece.write(status, to);
+}
+
+// --- The platform -----------------------------------------------------------------------------------------------
+
+bool lie_apart(std::size_t count, const double* times_s, const double* positions_m, const double* velocities_m_s) {
+    constexpr std::size_t kVector = 3 * sizeof(double);
+    if (count > PTRDIFF_MAX / kVector) return false;
+    const quo::Extent times{times_s, sizeof *times_s, count};
+    const quo::Extent positions{positions_m, kVector, count}, velocities{velocities_m_s, kVector, count};
+    return times.fits() && positions.fits() && velocities.fits() && !times.overlaps(positions) &&
+           !times.overlaps(velocities) && !positions.overlaps(velocities);
 }
 
 // --- Forward ----------------------------------------------------------------------------------------------------
@@ -213,5 +225,21 @@ int Obj::earth2sat(const OrbitTargets& targets, const OrbitSightings& seen) cons
         piece.write(block.t_s, seen.azimuth_s);
         piece.write(block.range_s, seen.range_s);
     });
+    return QUO_OK;
+}
+
+int Obj::SVGetStates(std::size_t count, const double* times_s, double* positions_m,
+                     double* velocities_m_s) const noexcept {
+    if (!modelReady()) return refuse(kStates, kNoModel);
+    if (count > 0 && !times_s) return refuse(kStates, kMissing);
+    if (!lie_apart(count, times_s, positions_m, velocities_m_s)) return refuse(kStates, kBadArrays);
+    for (std::size_t i = 0; i < count; ++i) {
+        quo::OrbitSample sample{};
+        sample.position = sample.velocity = {kNaN, kNaN, kNaN};
+        quo::RunCursor cursor = model_->fresh();
+        if (std::isfinite(times_s[i])) place_platform(*model_, cursor, times_s[i], &sample);
+        if (positions_m) quo::store(sample.position, positions_m + 3 * i);
+        if (velocities_m_s) quo::store(sample.velocity, velocities_m_s + 3 * i);
+    }
     return QUO_OK;
 }
