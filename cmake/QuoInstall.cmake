@@ -25,7 +25,7 @@ set(config_dir ${CMAKE_INSTALL_LIBDIR}/cmake/quo_base)
 install(EXPORT quo_base_targets FILE quo_base-targets.cmake NAMESPACE quo_base:: DESTINATION ${config_dir})
 configure_package_config_file("${PROJECT_SOURCE_DIR}/cmake/quo_base-config.cmake.in"
     "${PROJECT_BINARY_DIR}/quo_base-config.cmake" INSTALL_DESTINATION ${config_dir})
-write_basic_package_version_file("${PROJECT_BINARY_DIR}/quo_base-config-version.cmake" COMPATIBILITY SameMinorVersion)
+write_basic_package_version_file("${PROJECT_BINARY_DIR}/quo_base-config-version.cmake" COMPATIBILITY SameMajorVersion)
 install(FILES "${PROJECT_BINARY_DIR}/quo_base-config.cmake" "${PROJECT_BINARY_DIR}/quo_base-config-version.cmake"
         DESTINATION ${config_dir})
 
