@@ -175,3 +175,9 @@ function(quo_add_existing folder)
         add_subdirectory(${folder})
     endif()
 endfunction()
+
+# The licences of others whose code is in what is installed.
+function(quo_install_licences folder)
+    install(FILES "${PROJECT_SOURCE_DIR}/cmake/debian/copyright" DESTINATION "${folder}" RENAME others.txt ${ARGN})
+    install(FILES /usr/share/common-licenses/GPL-3 DESTINATION "${folder}" OPTIONAL ${ARGN})
+endfunction()
