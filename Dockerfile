@@ -1,5 +1,5 @@
-# An image with the tool, the library and what is needed to build against it, made from the Debian packages. Nothing of the
-# tests runs this file: it was not built where the project is checked.
+# An image with the tool, the library, its headers and documents, made from the Debian packages; it has no compiler.
+# Nothing of the tests runs this file: it was not built where the project is checked.
 #   docker build -t quo . && docker run --rm -v "$PWD:/data" -w /data quo info scene.hdr
 FROM debian:12 AS build
 RUN apt-get update && apt-get install -y --no-install-recommends \

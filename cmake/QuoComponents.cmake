@@ -156,12 +156,18 @@ function(quo_bench name)
 endfunction()
 
 # quo_fuzz(name SOURCES ... COMPONENTS component ...): one libFuzzer target, seeded from fuzz/corpus/<name>, part of
-# the target fuzz_targets, and a test that runs it for a few seconds.
+# the target fuzz_targets, and a test that runs it for a few seconds; where no fuzzer is built, a test of its seeds alone.
 function(quo_fuzz name)
     cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "SOURCES;COMPONENTS")
     set(target ${name}_fuzz)
     add_executable(${target} ${arg_SOURCES})
     quo_link_components(${target} ${arg_COMPONENTS})
+    if(NOT QUO_BUILD_FUZZ)
+        set_target_properties(${target} PROPERTIES QUO_LAST_OPTIONS "${quo_quick_build}")
+        target_link_libraries(${target} PRIVATE quo_fuzz_seeds)
+        add_test(NAME seeds.${name} COMMAND ${target} "${PROJECT_SOURCE_DIR}/fuzz/corpus/${name}")
+        return()
+    endif()
     target_link_options(${target} PRIVATE -fsanitize=fuzzer)
     add_dependencies(fuzz_targets ${target})
     add_test(NAME fuzz.${name} COMMAND "${PROJECT_SOURCE_DIR}/scripts/fuzz.sh" 0.06 "$<TARGET_FILE:${target}>")
@@ -171,4 +177,10 @@ function(quo_add_existing folder)
     if(EXISTS "${CMAKE_CURRENT_SOURCE_DIR}/${folder}/CMakeLists.txt")
         add_subdirectory(${folder})
     endif()
+endfunction()
+
+# The licences of others whose code is in what is installed.
+function(quo_install_licences folder)
+    install(FILES "${PROJECT_SOURCE_DIR}/cmake/debian/copyright" DESTINATION "${folder}" RENAME others.txt ${ARGN})
+    install(FILES /usr/share/common-licenses/GPL-3 DESTINATION "${folder}" OPTIONAL ${ARGN})
 endfunction()

@@ -16,16 +16,25 @@ install(FILES "${TRIO_INCLUDE_DIR}/trio.h" "${TRIO_INCLUDE_DIR}/triop.h" "${TRIO
 # Beside each other as in the source tree, so that their links hold.
 install(FILES "${PROJECT_SOURCE_DIR}/LICENSE" "${PROJECT_SOURCE_DIR}/NOTICE" DESTINATION ${CMAKE_INSTALL_DOCDIR}
         COMPONENT runtime)
+quo_install_licences(${CMAKE_INSTALL_DOCDIR}/licences COMPONENT runtime)
 install(FILES "${PROJECT_SOURCE_DIR}/README.md" "${PROJECT_SOURCE_DIR}/CHANGELOG.md" DESTINATION ${CMAKE_INSTALL_DOCDIR})
 install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples" DESTINATION ${CMAKE_INSTALL_DOCDIR})
 install(DIRECTORY "${PROJECT_SOURCE_DIR}/docs" DESTINATION ${CMAKE_INSTALL_DOCDIR}
-        FILES_MATCHING PATTERN "*.md" PATTERN "*.png" PATTERN doxygen EXCLUDE)
+        FILES_MATCHING PATTERN "*.md" PATTERN "*.png" PATTERN "*.svg" PATTERN doxygen EXCLUDE)
+# What the tool's and Python's users read comes with those, too.
+install(FILES "${PROJECT_SOURCE_DIR}/docs/tools.md" "${PROJECT_SOURCE_DIR}/docs/tutorial.md"
+        DESTINATION ${CMAKE_INSTALL_DOCDIR}/docs COMPONENT tools)
+if(QUO_PYTHON)
+    install(FILES "${PROJECT_SOURCE_DIR}/docs/python.md" "${PROJECT_SOURCE_DIR}/docs/scaling.md"
+            DESTINATION ${CMAKE_INSTALL_DOCDIR}/docs COMPONENT python)
+    install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples/python" DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT python)
+endif()
 
 set(config_dir ${CMAKE_INSTALL_LIBDIR}/cmake/quo_base)
 install(EXPORT quo_base_targets FILE quo_base-targets.cmake NAMESPACE quo_base:: DESTINATION ${config_dir})
 configure_package_config_file("${PROJECT_SOURCE_DIR}/cmake/quo_base-config.cmake.in"
     "${PROJECT_BINARY_DIR}/quo_base-config.cmake" INSTALL_DESTINATION ${config_dir})
-write_basic_package_version_file("${PROJECT_BINARY_DIR}/quo_base-config-version.cmake" COMPATIBILITY SameMinorVersion)
+write_basic_package_version_file("${PROJECT_BINARY_DIR}/quo_base-config-version.cmake" COMPATIBILITY SameMajorVersion)
 install(FILES "${PROJECT_BINARY_DIR}/quo_base-config.cmake" "${PROJECT_BINARY_DIR}/quo_base-config-version.cmake"
         DESTINATION ${config_dir})
 

@@ -7,11 +7,13 @@ foreach(component IN LISTS CPACK_COMPONENTS_ALL)
     file(MAKE_DIRECTORY "${folder}")
     # What is installed as the project's documents is the package's here, where the licence has a place of its own.
     file(GLOB documents "${stage}/share/doc/quo_base/*")
-    list(REMOVE_ITEM documents "${stage}/share/doc/quo_base/LICENSE")
+    list(REMOVE_ITEM documents "${stage}/share/doc/quo_base/LICENSE" "${stage}/share/doc/quo_base/licences")
     file(COPY ${documents} DESTINATION "${folder}")
     file(REMOVE_RECURSE "${stage}/share/doc/quo_base")
     file(COPY_FILE "${CMAKE_CURRENT_LIST_DIR}/debian/copyright" "${folder}/copyright")
     file(COPY "${CMAKE_CURRENT_LIST_DIR}/../CHANGELOG.md" DESTINATION "${folder}")
+    execute_process(COMMAND "${CMAKE_CURRENT_LIST_DIR}/package_links.sh" "${stage}" "${CPACK_DEBIAN_${upper}_PACKAGE_NAME}"
+        COMMAND_ERROR_IS_FATAL ANY)
     string(TIMESTAMP date "%a, %d %b %Y 00:00:00 +0000" UTC)
     file(WRITE "${folder}/changelog" "quo-base (${CPACK_PACKAGE_VERSION}) unstable; urgency=medium
 
@@ -28,3 +30,6 @@ file(GLOB placed "${CPACK_TEMPORARY_DIRECTORY}/tools/usr/bin/quo"
 foreach(file IN LISTS placed)
     file(RPATH_REMOVE FILE "${file}")
 endforeach()
+# Debian's zsh looks for what packages bring in a folder of its own.
+set(zsh "${CPACK_TEMPORARY_DIRECTORY}/tools/usr/share/zsh")
+file(RENAME "${zsh}/site-functions" "${zsh}/vendor-completions")

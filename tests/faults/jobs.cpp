@@ -61,7 +61,7 @@ Run read_product(Folder folder) {
 Run use_orbit(Folder folder) {
     auto read = std::make_shared<GeneralSAROrbit>(), copy = std::make_shared<GeneralSAROrbit>();
     auto record = std::make_shared<SAROrbitStateVectors_Obj>();
-    return [=, file = file_in(folder, "whole.hdr")] {
+    return [=, file = file_in(folder, "orbit.hdr")] {
         std::vector<SVFinding> findings;
         int status = copy->SVCreate(1.5, 9.7, 12);
         if (status == 0 && copy->nSV_n != 12) std::abort();
@@ -313,6 +313,21 @@ Run report(Folder folder) {
     };
 }
 
+/** An annotation and its measurement, taken from a seed that has the lengths of both in its first line. */
+constexpr char kDelivered[] = "s1a-iw-grd-vv-20211223t051122-20211223t051147-030148-039993-001";
+void lay_out_delivery(const std::string& folder) {
+    std::istringstream seed{test::read_text(QUO_IMPORT_SEED)};
+    std::size_t lengths[2]{};
+    seed >> lengths[0] >> lengths[1];
+    seed.ignore();
+    for (const auto& [length, place] : {std::pair{lengths[0], "/annotation/"}, {lengths[1], "/measurement/"}}) {
+        std::filesystem::create_directory(folder + place);
+        std::string part(length, '\0');
+        seed.read(part.data(), static_cast<std::streamsize>(length));
+        test::write_text(folder + place + kDelivered + (place[1] == 'a' ? ".xml" : ".tiff"), part);
+    }
+}
+
 constexpr auto kOldOrNew = test::Promise::kOldOrNew, kReports = test::Promise::kReports,
                kUnchanged = test::Promise::kUnchanged, kTells = test::Promise::kTells,
                kSurvives = test::Promise::kSurvives, kSilent = test::Promise::kSilent;
@@ -380,9 +395,16 @@ const std::vector<test::Job>& test::jobs() {
 
 // Among them a header with more names than the first room of the parser's dictionary, and a description that needs
 // memory of its own.
-void test::lay_out(const std::string& folder) {
+void test::lay_out(const std::string& folder, const Job& job) {
     for (const auto& file : std::filesystem::directory_iterator{QUO_TEST_DATA "/faults"})
         write_text(folder + '/' + file.path().filename().string(), read_text(file.path()));
-    write_text(folder + "/scene.xml", read_text(kScenes[0].path(".xml")));
+    std::string scene = read_text(kScenes[0].path(".xml"));
+    scene.insert(scene.find("</Channel>"),
+                 "<RasterInfo><NrOfLinesPerImage>12236</NrOfLinesPerImage>"
+                 "<NrOfPixelsPerLine>22694</NrOfPixelsPerLine><HeaderOffset>0</HeaderOffset>"
+                 "<RowPrefix>0</RowPrefix><ByteOrder>0</ByteOrder><CellType>2</CellType>"
+                 "</RasterInfo>");
+    write_text(folder + "/scene.xml", scene);
     std::filesystem::permissions(folder + "/a.par", std::filesystem::perms{0640});
+    if (job.name.starts_with("import")) lay_out_delivery(folder);
 }

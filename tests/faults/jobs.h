@@ -27,8 +27,8 @@ struct Job {
 const std::vector<Job>& jobs();
 void PrintTo(const Job& job, std::ostream* stream);
 
-/** The files that all jobs find. */
-void lay_out(const std::string& folder);
+/** The files that all jobs find, and for imports a product. */
+void lay_out(const std::string& folder, const Job& job);
 /** The name of a file in the folder; it lives as long as the process. */
 const char* file_in(const std::string& folder, const char* name);
 

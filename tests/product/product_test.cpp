@@ -341,9 +341,10 @@ constexpr struct {
     int (*call)(P whole, P bare, O o);  ///< `bare` tells neither look side nor wavelength
 } kRefusals[] = {
     {"open nothing", 1, [](P, P, O o) { return quo_product_open(nullptr, nullptr, &o.handle); }},
-    {"open what is not there", 1,
+    {"open what is not there", 9,
      [](P, P, O o) { return quo_product_open("/none/scene.hdr", nullptr, &o.handle); }},
-    {"open no header", 1, [](P, P, O o) { return quo_product_open(__FILE__, nullptr, &o.handle); }},
+    {"open no header", 1,
+     [](P, P, O o) { return quo_product_open(QUO_TEST_DATA "/faults/a.par", nullptr, &o.handle); }},
     {"open without the raster's description", 1,
      [](P, P, O o) { return quo_product_open(kScene.path(".xml").c_str(), "/none/raster", &o.handle); }},
     {"length of nothing", 1, [](P whole, P, O o) { return quo_product_length(whole, nullptr, &o.length); }},

@@ -101,6 +101,10 @@ bool concerns_folder(const Row& row, const Arguments& arguments) {
 /** Counts the call; whether the fault strikes it. */
 bool strikes(const Row& row) {
     const test::Fault& fault = watched->fault;
+    for (const Call kind : {row.call, Call::kAny}) {
+        ++watched->counted[0][static_cast<int>(kind)];
+        if (row.length != 0) ++watched->counted[1][static_cast<int>(kind)];
+    }
     if (fault.call != row.call && fault.call != Call::kAny) return false;
     if (fault.error == test::kShort && row.length == 0) return false;
     const long now = ++watched->calls;

@@ -42,12 +42,13 @@ struct Fault {
 /** What a watched process is told and tells; in memory that it shares with its parent. */
 struct Watch {
     Fault fault;
-    char folder[200];  ///< only files below it count
-    long calls;        ///< of the kind that is to fail
-    long descriptors;  ///< of files in the folder that are open
-    bool reached;      ///< the fault has happened
-    bool returned;     ///< the job came back: what is open then stays open
-    bool blocks;       ///< it left tracked memory
+    char folder[200];                                 ///< only files below it count
+    long calls;                                       ///< of the kind that is to fail
+    long counted[2][static_cast<int>(Call::kNever)];  ///< calls of each kind; of them those that move bytes
+    long descriptors;                                 ///< of files in the folder that are open
+    bool reached;                                     ///< the fault has happened
+    bool returned;                                    ///< the job came back: what is open then stays open
+    bool blocks;                                      ///< it left tracked memory
 };
 
 /** From here on this process, which must not end but by exec or exit, is watched. Its system calls on the folder

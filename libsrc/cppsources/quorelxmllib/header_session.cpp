@@ -100,7 +100,8 @@ int HeaderSession::commit() noexcept {
     if (failed_ != QUO_OK) return frame.callee(failed_);
     if (!changed_) return frame.success();
     return guarded(frame, [&] {
-        if (!document_->save(file_.c_str())) return frame.fail(QUO_REFUSED, "File writing failed!");
+        if (!document_->save(file_.c_str()))
+            return frame.fail(QUO_REFUSED, (file_ + ": File writing failed!").c_str());
         CallFrame::drop_errno();
         changed_ = false;
         return frame.success();

@@ -23,8 +23,8 @@ constexpr quo::FieldTable kTable{
     QUO_FIELD(FastStartTime, quo::kProfileOptional, quo::unit("s")),
     QUO_FIELD(FastTimeLength, quo::kProfileOptional, quo::unit("s")),
     QUO_FIELD(FastTimeDelta, quo::kProfileOptional, quo::unit("s")),
-    QUO_FIELD(Lines, quo::kProfileOptional),
-    QUO_FIELD(Samples),
+    QUO_FIELD(Lines, quo::kProfileOptional, quo::at_least(0)),
+    QUO_FIELD(Samples, quo::at_least(0)),
 };
 }  // namespace roi
 

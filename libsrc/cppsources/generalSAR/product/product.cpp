@@ -1,11 +1,14 @@
 #include "quo_base/product.h"
 
+#include <unistd.h>
+
 #include <algorithm>
 #include <array>
 #include <cstdint>
 #include <memory>
 #include <optional>
 #include <span>
+#include <string>
 #include <string_view>
 #include <utility>
 #include <vector>
@@ -222,6 +225,12 @@ int read_block(const DataFile& raster, const Block& block, int cell_type, void* 
                             static_cast<char*>(to));
 }
 
+/** What is said of a file that no product is in. */
+std::string without_object(const char* header) {
+    const std::string defect = quorelxml::xmlDefect(header);
+    return std::string{header} + ": holds no object of a product" + (defect.empty() ? "" : "; as XML: " + defect);
+}
+
 }  // namespace
 
 extern "C" {
@@ -232,12 +241,14 @@ int quo_product_open(const char* header, const char* raster, quo_product** produ
     return quo::guarded(frame, [&] {
         auto made = std::make_shared<OpenProduct>();
         const quo::HeaderSession session{header};  // the pixel grid is read from the same document
+        if (access(header, R_OK) != 0)
+            return frame.fail(QUO_NOT_OPENED, (std::string{header} + ": cannot be opened").c_str());
         if (const int status = made->header.GSread(header)) return frame.callee(status);
         const int status = raster ? made->raster.read_hdr(raster) : take_described_raster(*made);
         if (status != QUO_OK) return frame.callee(status);
         made->grid_status = read_image_grid(header, made->header, made->grid);
         if (made->grid_status == QUO_NO_MEMORY) return frame.callee(QUO_NO_MEMORY);
-        if (!holds_something(*made)) return frame.fail(QUO_REFUSED, "The file holds no object of a product");
+        if (!holds_something(*made)) return frame.fail(QUO_REFUSED, without_object(header).c_str());
         *product = open_products().hold(std::move(made));
         return frame.success();
     });
@@ -441,7 +452,10 @@ int quo_product_read(const quo_product* product, std::int32_t first_line, std::i
         if (*bytes == 0) return frame.success();
         if (!block) return frame.fail(QUO_REFUSED, kNull);
         const int failed = read_block(open.raster, wanted, cell_type, block);
-        return failed ? frame.fail(failed, quo::raster_failure(failed)) : frame.success();
+        if (!failed) return frame.success();
+        char message[768];
+        quo::format_bounded(message, sizeof message, "%s: %s", open.raster.FileName, quo::raster_failure(failed));
+        return frame.fail(failed, message);
     });
 }
 
