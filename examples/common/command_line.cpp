@@ -3,6 +3,7 @@
 #include <CLI/CLI.hpp>
 #include <algorithm>
 #include <cstdint>
+#include <sstream>
 #include <utility>
 
 #include "blocks.h"
@@ -37,7 +38,10 @@ void Command::threads(int& value) {
     takes("--threads", value, "Threads to work with; all processors unless told", {.within = {{1, 1024}}});
 }
 
-void Command::details(const char* text) { app_->footer(text); }
+void Command::details(const std::string& text) {
+    const std::string inherited = app_->get_footer();
+    app_->footer(inherited.empty() ? text : text + "\n" + inherited);
+}
 
 Command Command::either(const char* title) {
     CLI::App* group = app_->add_option_group(title)->require_option(1);
@@ -57,7 +61,9 @@ Program::Program(const char* about, const char* name)
 void Program::version(const char* text) { app_->set_version_flag("--version", text); }
 
 void Program::examples(const char* verb, const std::string& lines) {
-    CLI::App* const app = app_->get_subcommand(verb);
+    CLI::App* app = app_.get();
+    std::istringstream words{verb};
+    for (std::string word; words >> word;) app = app->get_subcommand(word);
     app->footer(app->get_footer() + "\nExamples:\n" + lines);
 }
 

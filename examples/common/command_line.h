@@ -51,8 +51,8 @@ public:
     /** Declares --threads: all processors, unless told. */
     void threads(int& value);
 
-    /** What the help says at its end. */
-    void details(const char* text);
+    /** What the help says at its end, before what that of the whole program says there. */
+    void details(const std::string& text);
     /** Options of which exactly one is to be given. */
     Command either(const char* title);
     /** Declares a verb, of which exactly one is to be given; one without a job has verbs of its own. */
@@ -72,7 +72,7 @@ public:
 
     /** Declares --version. */
     void version(const char* text);
-    /** Shows examples of a verb at the end of its help, lines as they are typed. */
+    /** Shows examples of a verb, or of "verb subverb", at the end of its help, lines as they are typed. */
     void examples(const char* verb, const std::string& lines);
     /** Puts what `changed` makes of it in the place of each value of a verb's options of these names. */
     void change(std::span<const std::string_view> names, std::string (*changed)(std::string));
