@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Prints docs/python_names.md: every name of the Python package with the first sentence of its documentation.
 
 Usage: PYTHONPATH=build/release/python /usr/bin/python3 scripts/python_names.py > docs/python_names.md
