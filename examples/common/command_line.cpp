@@ -20,6 +20,8 @@ void Command::takes(const char* name, T& value, const char* about, const Rules& 
     if (rules.values > 0) option->expected(rules.values);
     if (rules.excludes) option->excludes(app_->get_option(rules.excludes));
     if (!rules.one_of.empty()) option->check(CLI::IsMember(rules.one_of));
+    if (!rules.offers.empty())
+        option->type_name(option->get_type_name() + ":{" + CLI::detail::join(rules.offers, ",") + "}");
     if (!rules.words.empty()) option->transform(CLI::Transformer(rules.words));
     if (rules.within) option->check(CLI::Range(rules.within->first, rules.within->second));
     if (rules.defect) option->check(rules.defect);
@@ -44,8 +46,8 @@ void Command::details(const std::string& text) {
     app_->footer(inherited.empty() ? text : text + "\n" + inherited);
 }
 
-Command Command::either(const char* title) {
-    CLI::App* group = app_->add_option_group(title)->require_option(1);
+Command Command::either(const char* title, const char* about) {
+    CLI::App* group = app_->add_option_group(title, about)->require_option(1);
     return {{app_, group}, job_};
 }
 
@@ -88,7 +90,9 @@ std::optional<int> Program::parse(int argc, char** argv, std::string* defect) {
 
 std::vector<std::string> Program::verbs() const {
     std::vector<std::string> names;
-    for (const CLI::App* verb : app_->get_subcommands({})) names.push_back(verb->get_name());
+    const CLI::App* last = app_.get();
+    while (!last->get_subcommands().empty()) last = last->get_subcommands().front();
+    for (const CLI::App* verb : last->get_subcommands({})) names.push_back(verb->get_name());
     return names;
 }
 

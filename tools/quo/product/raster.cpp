@@ -143,6 +143,8 @@ std::string type_name(int cell_type) {
                : std::to_string(cell_type);
 }
 
+std::vector<std::string> type_names() { return {kNames.begin(), kNames.end()}; }
+
 int type_of(std::string_view name) {
     const auto same = [name](std::string_view known) {
         return std::ranges::equal(
