@@ -274,7 +274,11 @@ int resample(const ResampleOptions& options) {
     if (options.lines > 0 && grid.readhdr((options.in + ".hdr").c_str()) == QUO_OK && grid.Bursts > 0)
         throw Failure(options.in + ": lines of bursts keep their sampling");
     note_interrupts();
-    Resampling{options, description}.run();
+    try {
+        Resampling{options, description}.run();
+    } catch (const TransformFailure& failure) {
+        throw Failure(options.in + ": " + failure.what());
+    }
     return kFine;
 }
 
