@@ -20,6 +20,8 @@ Every name of the package, as its own documentation begins; `help()` has the res
 
 
 def sentence(thing):
+    if isinstance(thing, dict):
+        return "One of: " + ", ".join(thing)
     text = " ".join((inspect.getdoc(thing) or "").split("\n\n")[0].split()).replace("|", "\\|").replace("`", "")
     return re.match(r"(.*?)(?:\.(?= [A-Z])|[.:;]?$)", text)[1]
 
