@@ -147,7 +147,7 @@ void compare_all(Scene& scene, std::span<const TiePoint> ties, int threads, Agre
 
 std::string points_of(const std::string& header, const TiepointsOptions& options) {
     if (!options.points.empty()) return options.points;
-    const std::string name = name_beside(header);
+    std::string name = name_beside(header);
     if (access(name.c_str(), F_OK) != 0)
         throw Failure(name + ": " + system_cause() + " (--points names another table)");
     return name;
