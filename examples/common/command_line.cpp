@@ -4,6 +4,7 @@
 #include <CLI/CLI.hpp>
 #include <algorithm>
 #include <cstdint>
+#include <sstream>
 #include <utility>
 
 #include "blocks.h"
@@ -19,6 +20,8 @@ void Command::takes(const char* name, T& value, const char* about, const Rules& 
     if (rules.values > 0) option->expected(rules.values);
     if (rules.excludes) option->excludes(app_->get_option(rules.excludes));
     if (!rules.one_of.empty()) option->check(CLI::IsMember(rules.one_of));
+    if (!rules.offers.empty())
+        option->type_name(option->get_type_name() + ":{" + CLI::detail::join(rules.offers, ",") + "}");
     if (!rules.words.empty()) option->transform(CLI::Transformer(rules.words));
     if (rules.within) option->check(CLI::Range(rules.within->first, rules.within->second));
     if (rules.defect) option->check(rules.defect);
@@ -38,10 +41,13 @@ void Command::threads(int& value) {
     takes("--threads", value, "Threads to work with; all processors unless told", {.within = {{1, 1024}}});
 }
 
-void Command::details(const char* text) { app_->footer(text); }
+void Command::details(const std::string& text) {
+    const std::string inherited = app_->get_footer();
+    app_->footer(inherited.empty() ? text : text + "\n" + inherited);
+}
 
-Command Command::either(const char* title) {
-    CLI::App* group = app_->add_option_group(title)->require_option(1);
+Command Command::either(const char* title, const char* about) {
+    CLI::App* group = app_->add_option_group(title, about)->require_option(1);
     return {{app_, group}, job_};
 }
 
@@ -58,7 +64,9 @@ Program::Program(const char* about, const char* name)
 void Program::version(const char* text) { app_->set_version_flag("--version", text); }
 
 void Program::examples(const char* verb, const std::string& lines) {
-    CLI::App* const app = app_->get_subcommand(verb);
+    CLI::App* app = app_.get();
+    std::istringstream words{verb};
+    for (std::string word; words >> word;) app = app->get_subcommand(word);
     app->footer(app->get_footer() + "\nExamples:\n" + lines);
 }
 
@@ -82,7 +90,9 @@ std::optional<int> Program::parse(int argc, char** argv, std::string* defect) {
 
 std::vector<std::string> Program::verbs() const {
     std::vector<std::string> names;
-    for (const CLI::App* verb : app_->get_subcommands({})) names.push_back(verb->get_name());
+    const CLI::App* last = app_.get();
+    while (!last->get_subcommands().empty()) last = last->get_subcommands().front();
+    for (const CLI::App* verb : last->get_subcommands({})) names.push_back(verb->get_name());
     return names;
 }
 

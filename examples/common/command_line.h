@@ -29,6 +29,7 @@ struct Rules {
     int values = 0;                  // how many it takes, where that is not one or any number
     const char* excludes = nullptr;  // another option
     std::vector<std::string> one_of = {};
+    std::vector<std::string> offers = {};                      // that the help shows; others are taken too
     std::map<std::string, int> words = {};                     // that stand for numbers
     std::optional<std::pair<int, int>> within = std::nullopt;  // both included
     std::string (*defect)(const std::string&) = nullptr;       // of a text; empty where it is fine
@@ -52,10 +53,10 @@ public:
     /** Declares --threads: all processors, unless told. */
     void threads(int& value);
 
-    /** What the help says at its end. */
-    void details(const char* text);
+    /** What the help says at its end, before what that of the whole program says there. */
+    void details(const std::string& text);
     /** Options of which exactly one is to be given. */
-    Command either(const char* title);
+    Command either(const char* title, const char* about);
     /** Declares a verb, of which exactly one is to be given; one without a job has verbs of its own. */
     Command verb(const char* name, const char* about, Job job = {});
 
@@ -73,7 +74,7 @@ public:
 
     /** Declares --version. */
     void version(const char* text);
-    /** Shows examples of a verb at the end of its help, lines as they are typed. */
+    /** Shows examples of a verb, or of "verb subverb", at the end of its help, lines as they are typed. */
     void examples(const char* verb, const std::string& lines);
     /** Puts what `changed` makes of it in the place of each value of a verb's options of these names. */
     void change(std::span<const std::string_view> names, std::string (*changed)(std::string));
@@ -84,7 +85,7 @@ public:
     /** Does the job of the verb that was given. */
     [[nodiscard]] int run() const { return (*job_)(); }
 
-    /** The verbs that there are, and the one that was given with its own. */
+    /** The verbs that there are below those given, and those given, the program's first. */
     [[nodiscard]] std::vector<std::string> verbs() const;
     [[nodiscard]] std::vector<std::string> given() const;
 };

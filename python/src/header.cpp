@@ -10,10 +10,13 @@
 #include "arrays.h"
 #include "errors.h"
 #include "quo_base/derived_raster.h"
+#include "quo_base/product.h"
 
 namespace quo_python {
 
 namespace {
+
+constexpr const char* kReading = "reading a product header";
 
 struct Corner {
     const char* name;
@@ -58,9 +61,25 @@ std::vector<std::string> sections_of(const GeneralSAR& all, Wanted wanted) {
 
 // --- Files ------------------------------------------------------------------------------------------------------
 
+namespace {
+
+/** Raises what opening a product says of a file that nothing was read from: no such file, or where it is no XML.
+ */
+[[noreturn]] void refuse_file(const std::string& file) {
+    run(kReading, [&] {
+        quo_product* product = nullptr;
+        const int status = quo_product_open(file.c_str(), nullptr, &product);
+        if (product) (void)quo_product_close(product);
+        return status;
+    });
+    raise(QUO_REFUSED, "the file holds no object of a product");
+}
+
+}  // namespace
+
 std::shared_ptr<Header> Header::read(const std::string& file) {
     auto header = std::make_shared<Header>();
-    run("reading a product header", [&] {
+    const Failure failure = attempt([&] {
         if (const int status = header->all_.GSread(file.c_str())) return status;
         header->all_.GSdisable(gsDataFile);
         header->all_.GSdisable(gsOrbit);
@@ -69,7 +88,9 @@ std::shared_ptr<Header> Header::read(const std::string& file) {
         header->grid_broken_ = grid != QUO_OK && grid != QUO_REFUSED;
         return int{QUO_OK};
     });
-    if (header->sections().empty()) raise(QUO_REFUSED, "the file holds no object of a product");
+    if (failure.status == QUO_REFUSED) refuse_file(file);
+    if (failure.status != QUO_OK) raise(failure, kReading);
+    if (header->sections().empty()) refuse_file(file);
     return header;
 }
 

@@ -98,7 +98,7 @@ def test_counts_of_polynomials_keep_those_that_stay(scene_file):
 @pytest.mark.parametrize(
     "status, kind, doing",
     [
-        (1, Refused, lambda product, folder: Product(folder / "absent.hdr")),
+        (9, FileError, lambda product, folder: Product(folder / "absent.hdr")),
         (5, FileError, lambda product, folder: product.save(folder / "absent" / "x.hdr")),
         (
             5,
@@ -116,6 +116,13 @@ def test_failures_tell_status_and_report_entry(scene_file, tmp_path, status, kin
     assert caught.value.system_error == (getattr(caught.value, "errno", None) or 0)
     copy = pickle.loads(pickle.dumps(caught.value))
     assert isinstance(copy, Error) and copy.entry == caught.value.entry
+
+
+def test_files_that_are_no_header_are_named_with_the_line_of_the_defect(scene_file, tmp_path):
+    (tmp_path / "cut.hdr").write_text("".join(scene_file.read_text().splitlines(True)[:30]))
+    for name, kind, said in (("cut", Refused, r"cut\.hdr: .*line \d+"), ("absent", FileError, r"absent\.hdr: ")):
+        with pytest.raises(kind, match=said):
+            Product(tmp_path / (name + ".hdr"))
 
 
 @pytest.mark.parametrize("wrong", ["a\0.hdr", "\udcff.hdr", b"\xff", 3])

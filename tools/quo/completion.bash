@@ -20,7 +20,10 @@ _quo() {
             return
         fi
     fi
-    if [ -n "$verbs" ] || [ "${current#-}" != "$current" ]; then
+    words=$(sed -n '/^Positionals:/,/^$/ s/^  [A-Z]* [^ ]*{\([^}]*\)}.*/\1/p' <<<"$help")
+    if [ -n "$words" ] && [ "${current#-}" = "$current" ] && [[ $previous != -* ]]; then
+        mapfile -t COMPREPLY < <(compgen -W "${words//,/ }" -- "$current")
+    elif [ -n "$verbs" ] || [ "${current#-}" != "$current" ]; then
         words=$(grep -oE -- '--[a-z][a-z-]*' <<<"$help" | sort -u)
         mapfile -t COMPREPLY < <(compgen -W "$verbs $words" -- "$current")
     else

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <filesystem>
 #include <new>
+#include <span>
 #include <string>
 #include <string_view>
 
@@ -37,12 +38,16 @@ std::string raster_name(std::string name) {
 constexpr std::string_view kHeaders[] = {"HEADER", "MASTER", "SLAVE", "header"}, kRasters[] = {"RASTER", "IN"};
 
 /** Says what is wrong with the command line, and where the user finds help on it. */
-std::string wrong_use(const command_line::Program& program, const std::string& what, std::string_view first_word) {
+std::string wrong_use(const command_line::Program& program, const std::string& what,
+                      std::span<const char* const> words) {
     std::string help = "quo", verbs;
     for (const std::string& verb : program.given()) help += " " + verb;
-    if (help != "quo" || first_word.starts_with('-')) return what + " (see " + help + " --help)";
     for (const std::string& verb : program.verbs()) verbs += (verbs.empty() ? "" : ", ") + verb;
-    return (first_word.empty() ? "no verb" : "no verb " + std::string{first_word}) + "; there are " + verbs;
+    const std::size_t next = program.given().size() + 1;
+    const std::string_view word = next < words.size() ? words[next] : "";
+    if (verbs.empty() || word.starts_with('-')) return what + " (see " + help + " --help)";
+    return (word.empty() ? "no verb" : "no verb " + std::string{word}) + "; there are " + verbs +
+           (help == "quo" ? "" : " (see " + help + " --help)");
 }
 
 int run(int argc, char** argv) {
@@ -59,7 +64,7 @@ int run(int argc, char** argv) {
         if (!defect.empty()) throw tool::WrongUse(defect);
         return status ? *status : program.run();
     } catch (const tool::WrongUse& wrong) {
-        throw tool::WrongUse(wrong_use(program, wrong.what(), argc > 1 ? argv[1] : ""));
+        throw tool::WrongUse(wrong_use(program, wrong.what(), {argv, static_cast<std::size_t>(argc)}));
     }
 }
 

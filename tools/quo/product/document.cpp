@@ -22,14 +22,18 @@ std::string xml_defect_or(const std::string& file, const std::string& cause) {
 
 }  // namespace
 
-void require_header_file(const std::string& file) {
-    static_assert(quorelxml::kMostFileBytes == 1LL << 30);
+void require_regular_file(const std::string& file) {
     std::error_code error;
     const auto kind = std::filesystem::status(file, error).type();
-    if (kind == std::filesystem::file_type::not_found) throw Failure(file + ": no such file");
-    if (kind == std::filesystem::file_type::none) throw Failure(file + ": " + error.message());
+    if (error) throw Failure(file + ": " + error.message());
     if (kind != std::filesystem::file_type::regular) throw Failure(file + ": not a regular file");
+}
+
+void require_header_file(const std::string& file) {
+    static_assert(quorelxml::kMostFileBytes == 1LL << 30);
+    require_regular_file(file);
     if (!std::ifstream{file}) throw Failure(file + ": " + system_cause());
+    std::error_code error;
     if (std::filesystem::file_size(file, error) > static_cast<std::uintmax_t>(quorelxml::kMostFileBytes))
         throw Failure(file + ": is larger than 1 GiB, the limit of a header");
 }

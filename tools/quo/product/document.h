@@ -10,6 +10,9 @@
 
 namespace tool {
 
+/** Throws Failure where a file is missing, or a folder or device. */
+void require_regular_file(const std::string& file);
+
 /** Throws Failure, with the cause, where a file is none that a header can be read from: missing, a folder or
  * device, not to be opened, or too large. */
 void require_header_file(const std::string& file);

@@ -13,7 +13,8 @@ bool is_unknown(const parElement& fresh, int index, std::string_view text) {
         return text == "NOT_AVAILABLE" || (known && text == value_text(fresh, index));
     const auto number = finite_number(text);
     if (number == kUnknown && fresh.type != parElement::typeInt) return true;
-    return number && known && number == finite_number(value_text(fresh, index));
+    // A 0 that is there before anything is known looks like a value: where the rule forbids it, it makes no sense.
+    return number && known && number != 0.0 && number == finite_number(value_text(fresh, index));
 }
 
 }  // namespace

@@ -12,8 +12,8 @@
 
 namespace tool {
 
-/** What is wrong with one value of a field, or nothing. What a new object holds in its place, "NOT_AVAILABLE", and
- * -999 where it is no count, mark a value that is not known. */
+/** What is wrong with one value of a field, or nothing. What a new object holds in its place other than 0,
+ * "NOT_AVAILABLE", and -999 where it is no count, mark a value that is not known. */
 std::string value_defect(const parElement& element, const parElement& fresh, int index, std::string_view text);
 
 /** The same for all values of a field, their number included. */

@@ -60,6 +60,24 @@ const parElement* Fields::at(std::string_view field) const {
     return quo::element_at(grid_, field);
 }
 
+std::string Fields::list_for(std::string_view field) {
+    std::string fields, sections;
+    const auto append = [](std::string& list, std::string_view name) {
+        list.append(list.empty() ? "" : ", ").append(name);
+    };
+    const auto look_at = [&](const GeneralSAR_Base& elements, std::string_view section) {
+        append(sections, section);
+        if (field.substr(0, field.find('/')) != section) return;
+        for (int i = 0; i < elements.elementCount(); ++i) append(fields, elements.element(i)->name);
+    };
+    for (int i = gsRoi; i < GeneralSAR::kObjects; ++i) {
+        const auto object = static_cast<GSObject>(i);
+        if (object != gsOrbit) look_at(elements_of(product_, object), section_of(product_, object));
+    }
+    look_at(grid_, grid_.element(0)->section);
+    return fields.empty() ? "; sections are " + sections : "; that section has " + fields;
+}
+
 bool Fields::is_numeric(std::string_view field) const {
     // Polynomials and corner points stand in sections of their own, as many as there are.
     for (const char* nested : {"/pol", "/trg0_s", "/taz0_s", "/Point"}) {

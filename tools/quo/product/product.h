@@ -25,6 +25,8 @@ class Fields {
 public:
     /** The element at a path such as "SamplingConstants/prf_hz"; null where no object has it. */
     const parElement* at(std::string_view field) const;
+    /** The fields of the section that a path names, else the sections that there are. */
+    std::string list_for(std::string_view field);
     /** Whether a field is known to hold numbers. */
     bool is_numeric(std::string_view field) const;
 

@@ -11,6 +11,7 @@
 #include <system_error>
 #include <type_traits>
 
+#include "document.h"
 #include "failure.h"
 #include "interrupt.h"
 #include "number.h"
@@ -116,8 +117,8 @@ void count_losses(const T* from, std::size_t count, int cell_type, Losses& losse
 
 void read_description(const std::string& name, DataFile& raster) {
     const std::string side_file = name + ".hdr";
-    if (kind_of(name) == std::filesystem::file_type::not_found) throw Failure(name + ": no such file");
-    if (kind_of(side_file) == std::filesystem::file_type::not_found) throw Failure(side_file + ": no such file");
+    require_regular_file(name);
+    require_regular_file(side_file);
     if (raster.read_hdr(name.c_str()) != QUO_OK)
         throw Failure(side_file + ": no complete description of a raster");
     const std::int64_t size = raster.rasterSize();
@@ -141,6 +142,8 @@ std::string type_name(int cell_type) {
                ? std::string{kNames[static_cast<std::size_t>(cell_type)]}
                : std::to_string(cell_type);
 }
+
+std::vector<std::string> type_names() { return {kNames.begin(), kNames.end()}; }
 
 int type_of(std::string_view name) {
     const auto same = [name](std::string_view known) {

@@ -21,6 +21,8 @@ void read_samples_description(const std::string& name, DataFile& raster);
 
 /** Name of a cell type as in side files ("INT32_COMPLEX" for the one without a name there), or its number. */
 std::string type_name(int cell_type);
+/** All of these names. */
+std::vector<std::string> type_names();
 /** The cell type of a name in any letter case. Throws WrongUse for another. */
 int type_of(std::string_view name);
 

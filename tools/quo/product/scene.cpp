@@ -1,12 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "scene.h"
 
-#include <fcntl.h>
-#include <sys/stat.h>
-#include <unistd.h>
-
 #include <algorithm>
-#include <cerrno>
 #include <cmath>
 
 #include "document.h"
@@ -19,16 +14,6 @@
 
 namespace tool {
 namespace {
-
-// The library answers for a file that is not there as for one that lacks the section; the user wants to know
-// which.
-void require_readable(const std::string& name) {
-    const int descriptor = open(name.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK);
-    struct stat about {};
-    if (descriptor < 0 || fstat(descriptor, &about) != 0) throw Failure(name + ": " + system_cause());
-    close(descriptor);
-    if (!S_ISREG(about.st_mode)) throw Failure(name + ": not a regular file");
-}
 
 std::vector<std::string> check(const GeneralSAROrbit& orbit) {
     std::vector<SVFinding> findings;
@@ -59,7 +44,7 @@ std::string why_no_orbit(const char* header, int status) {
 }  // namespace
 
 Scene::Scene(const std::string& header, Vectors vectors) : name_{header} {
-    require_readable(name_);
+    require_header_file(name_);  // the library answers for a missing file as for one that lacks the section
     // In one go: of a file that can be read at one time and not at another, a wavelength that was not found would
     // count as one that is not there.
     GeneralSAR product;

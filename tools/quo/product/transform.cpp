@@ -3,14 +3,13 @@
 
 #include <string>
 
-#include "failure.h"
-
 namespace tool {
 
 void require_transform(int status) {
     if (status == QUO_OK) return;
     const std::string cause = fft_engine_error();
-    throw Failure(cause.empty() ? "the transform cannot be had, status " + std::to_string(status) : cause);
+    throw TransformFailure(cause.empty() ? "the transform cannot be had, status " + std::to_string(status)
+                                         : cause);
 }
 
 Transform::Transform(int n, int m, int along_rows, int down_columns) {

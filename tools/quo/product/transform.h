@@ -2,12 +2,13 @@
 #ifndef QUO_TOOL_TRANSFORM_H
 #define QUO_TOOL_TRANSFORM_H
 
+#include "failure.h"
 #include "quo_base/fft.h"
 
 namespace tool {
 
-/** A plan in place, for images of m rows of n samples, released with the object. Throws Failure where there is no
- * such plan, and where it cannot be run. */
+/** A plan in place, for images of m rows of n samples, released with the object. Throws TransformFailure where
+ * there is no such plan, and where it cannot be run. */
 class Transform {
 public:
     /** Directions as fft_makep_c() takes them. */
@@ -22,7 +23,12 @@ private:
     FftPlan plan_{};
 };
 
-/** Throws Failure unless the status of a transform is 0. */
+/** A transform that cannot be had, such as one for which memory does not suffice; the message names no file. */
+class TransformFailure : public Failure {
+    using Failure::Failure;
+};
+
+/** Throws TransformFailure unless the status of a transform is 0. */
 void require_transform(int status);
 
 }  // namespace tool

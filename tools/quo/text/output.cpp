@@ -2,10 +2,12 @@
 #include "output.h"
 
 #include <fcntl.h>
+#include <strings.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
+#include <filesystem>
 
 #include "failure.h"
 #include "interrupt.h"
@@ -94,6 +96,12 @@ void commit_together(Output& first, Output& second) {
         throw Failure(first.name_ + ", " + second.name_ + ": cannot be written together: " + system_cause());
     first.say_in_place();
     second.say_in_place();
+}
+
+void require_png_name(const std::string& name) {
+    const std::string ending = std::filesystem::path{name}.extension();
+    if (!ending.empty() && strcasecmp(ending.c_str(), ".png") != 0)
+        throw WrongUse(name + ": pictures are written as PNG, whose names end with .png");
 }
 
 void write_output(const std::string& name, std::string_view text) {

@@ -48,6 +48,9 @@ private:
 /** Two results that belong together are complete: both files appear, or none does. Throws Failure. */
 void commit_together(Output& first, Output& second);
 
+/** Throws WrongUse for the name of a picture that ends like a file of another kind. */
+void require_png_name(const std::string& name);
+
 /** Writes a whole result in one step. Throws Failure. */
 void write_output(const std::string& name, std::string_view text);
 

@@ -296,7 +296,9 @@ void add_config(Command& program) {
     };
 
     Command command = add("new", "Writes records with their defaults", write_new);
-    command.needs("RECORD", options->records, "Records, such as AzimuthConf");
+    const auto names = Record::names();
+    const command_line::Rules known{.offers = {std::begin(names), std::end(names)}};
+    command.needs("RECORD", options->records, "Records, such as AzimuthConf", known);
     command.needs("-o,--output", options->file, "File to write or to add to, - for standard output");
     command.flag("--replace", options->replace, "Write records anew that FILE has already");
 
@@ -310,7 +312,7 @@ void add_config(Command& program) {
 
     command = add("doc", "Prints every parameter: type, unit, bounds, default, meaning",
                   [](const ConfigOptions& chosen) { return document(chosen.records); });
-    command.takes("RECORD", options->records, "Records to describe; all where none is named");
+    command.takes("RECORD", options->records, "Records to describe; all where none is named", known);
 }
 
 }  // namespace tool

@@ -244,7 +244,8 @@ void add_convert(Command& program) {
     auto [command, options] = add_verb(program, "convert", "Cuts and converts a raster of any size", convert);
     command.needs("IN", options.in, "Raster with a side file IN.hdr");
     command.needs("OUT", options.out, "Raster to write, with a side file OUT.hdr");
-    command.takes("--type", options.type, "Cell type of OUT, such as FLOAT32 or SHORT_COMPLEX");
+    command.takes("--type", options.type, "Cell type of OUT, such as FLOAT32 or SHORT_COMPLEX",
+                  {.offers = type_names()});
     command.takes("--order", options.order, "Byte order of OUT: l little-endian, m big-endian",
                   {.one_of = {"l", "m"}});
     command.takes("--lines", options.lines, "Lines A:B, counted from 0, B excluded");

@@ -213,7 +213,7 @@ int coregister(const CoregisterOptions& options) {
     constexpr std::size_t kFewest = 20;
     if (matches.size() < kFewest)
         throw Failure(options.slave + ": shares " + std::to_string(matches.size()) + " of 1000 points with " +
-                      options.master);
+                      options.master + " (quo footprint tells where each of them lies)");
     Coregist mapping;
     fit_times(matches, master.region, mapping);
     fit_samples(matches, master, slave, mapping);

@@ -5,7 +5,8 @@
 namespace tool {
 
 /** How a verb is called, in lines that a shell takes as they stand. All of them are of one made-up folder, in
- * which each works: a product `image` with its header, a header `scene.xml` without a raster, and tables. */
+ * which each works: a product `image` with its header, a header `scene.xml` without a raster, and tables; later
+ * ones may use what earlier ones write. */
 struct Example {
     const char *verb, *lines;
 };
@@ -36,6 +37,10 @@ inline constexpr Example kExamples[] = {
     {"config",
      "  quo config new AzimuthConf -o processing.xml\n"
      "  quo config check processing.xml\n"},
+    {"config new", "  quo config new AzimuthConf -o azimuth.xml\n"},
+    {"config show", "  quo config show azimuth.xml --json\n"},
+    {"config check", "  quo config check azimuth.xml\n"},
+    {"config doc", "  quo config doc AzimuthConf\n"},
     {"debug-dump", "  quo debug-dump chirp.dump --values 4\n"},
 };
 

@@ -51,7 +51,8 @@ public:
         : file_{options.header}, json_{options.json}, numeric_{options.json && is_number(options.field)} {
         require_header_file(file_);
         is_array_ = read(options.field + "/val");
-        if (!is_array_ && !read(options.field)) throw Failure(file_ + ": has no field " + options.field);
+        if (!is_array_ && !read(options.field))
+            throw Failure(file_ + ": has no field " + options.field + Fields{}.list_for(options.field));
     }
 
     /** The values: in JSON those of an object's member, separated by commas, else lines. */

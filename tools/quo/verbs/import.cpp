@@ -79,8 +79,10 @@ void add_import(Command& program) {
         add_verb(program, "import", "Takes over a Sentinel-1 product: SLC or GRD", import_product);
     command.needs("PRODUCT", options.source, "Folder *.SAFE, its manifest, or an annotation file");
     command.needs("OUT", options.raster, "Raster to make, with a header OUT.hdr");
-    command.takes("--swath", options.swath, "Swath, such as IW1, where there are several");
-    command.takes("--polarization", options.polarization, "Polarization, such as VV, where there are several");
+    command.takes("--swath", options.swath, "Swath, such as IW1, where there are several",
+                  {.offers = {"IW1", "IW2", "IW3", "EW1", "EW2", "EW3", "EW4", "EW5"}});
+    command.takes("--polarization", options.polarization, "Polarization, such as VV, where there are several",
+                  {.offers = {"VV", "VH", "HH", "HV"}});
     command.takes("--orbit", options.orbit, "Orbit file whose vectors take the place of the annotation's");
     command.flag("--link", options.link, "Make OUT a link to the measurement, whose samples are not copied");
     command.flag("--waitbar", options.waitbar, "Tell the progress on standard error, as commands of a waitbar");

@@ -185,6 +185,7 @@ void require_sense(const QuicklookOptions& options) {
     std::vector<std::string> written{options.picture};
     if (options.world) written.push_back(world_name(options.picture));
     require_apart(raster_files(options.raster), written);
+    require_png_name(options.picture);
 }
 
 int quicklook(const QuicklookOptions& options) {
@@ -234,7 +235,8 @@ void add_quicklook(Command& program) {
     command.needs("RASTER", options.raster, "Raster with a side file RASTER.hdr");
     command.needs("OUT", options.picture, "Picture to write (PNG)");
     command.takes("--looks", options.looks, "Lines x samples averaged into a pixel, such as 4x1");
-    command.takes("--db", options.db, "Black and white: MIN:MAX in dB, or auto (percentiles)");
+    command.takes("--db", options.db, "Black and white: MIN:MAX in dB, or auto (percentiles)",
+                  {.offers = {"auto"}});
     command.takes("--width", options.width, "Greatest width in pixels, in place of --looks (1000)",
                   {.excludes = "--looks"});
     command.flag("--north-up", options.north_up,

@@ -274,7 +274,11 @@ int resample(const ResampleOptions& options) {
     if (options.lines > 0 && grid.readhdr((options.in + ".hdr").c_str()) == QUO_OK && grid.Bursts > 0)
         throw Failure(options.in + ": lines of bursts keep their sampling");
     note_interrupts();
-    Resampling{options, description}.run();
+    try {
+        Resampling{options, description}.run();
+    } catch (const TransformFailure& failure) {
+        throw Failure(options.in + ": " + failure.what());
+    }
     return kFine;
 }
 
@@ -285,7 +289,7 @@ void add_resample(Command& program) {
         add_verb(program, "resample", "Changes the number of samples or lines of a raster of any size", resample);
     command.needs("IN", options.in, "Raster with a side file IN.hdr");
     command.needs("OUT", options.out, "Raster to write, with a side file OUT.hdr");
-    Command size = command.either("New size");
+    Command size = command.either("New size", "What OUT has more or fewer of");
     size.takes("--samples", options.samples, "Samples per line", {.within = {{1, INT_MAX}}});
     size.takes("--lines", options.lines, "Lines", {.within = {{1, INT_MAX}}});
     command.takes("--centre", options.centre, "Centre of the band in cycles per sample, where it is not 0",

@@ -218,6 +218,7 @@ int spectrum(const SpectrumOptions& options) {
     std::vector<std::string> read = raster_files(options.raster);
     if (!options.header.empty()) read.push_back(options.header);
     require_apart(read, {options.picture});
+    require_png_name(options.picture);
     const Rates rates = rates_of(options.header);
     DataFile raster;
     read_samples_description(options.raster, raster);

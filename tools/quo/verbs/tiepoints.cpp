@@ -1,4 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <unistd.h>
+
 #include <algorithm>
 #include <array>
 #include <memory>
@@ -97,7 +99,7 @@ Vertical vertical_of(const Table& table, const std::string& option) {
 }
 
 /** The tie points that stand beside a header: scene_tie_points.csv beside scene.xml. */
-std::string points_beside(const std::string& header) {
+std::string name_beside(const std::string& header) {
     const std::size_t dot = header.rfind('.');
     const std::size_t slash = header.rfind('/');
     const bool extension = dot != std::string::npos && (slash == std::string::npos || dot > slash);
@@ -143,11 +145,19 @@ void compare_all(Scene& scene, std::span<const TiePoint> ties, int threads, Agre
     });
 }
 
+std::string points_of(const std::string& header, const TiepointsOptions& options) {
+    if (!options.points.empty()) return options.points;
+    std::string name = name_beside(header);
+    if (access(name.c_str(), F_OK) != 0)
+        throw Failure(name + ": " + system_cause() + " (--points names another table)");
+    return name;
+}
+
 Agreement check_scene(const std::string& header, const TiepointsOptions& options) {
     Scene scene{header};
     scene.require_look_side();
     scene.require_wavelength();
-    Table table{options.points.empty() ? points_beside(header) : options.points};
+    Table table{points_of(header, options)};
     const std::size_t columns[] = {table.need(kAzimuthTime),   table.need("range_time_s"),
                                    table.need("latitude_deg"), table.need("longitude_deg"),
                                    table.need("height_m"),     table.need("incidence_deg")};
