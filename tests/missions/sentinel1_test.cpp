@@ -574,6 +574,14 @@ TEST(Sentinel1, NamesTheFileThatIsDamaged) {
     EXPECT_EQ(import_safe(slc.path(), folder.file("scene"), waiting), 1);
     EXPECT_EQ(waiting.message, slc.measurement() + ": is no regular file");
     EXPECT_EQ(result.message, slc.measurement() + ": is cut short or damaged at line 0");
+    // The system's cause, of the name that was asked for; libtiff's complaint, which names the file itself.
+    fs::remove(slc.measurement());
+    fs::rename(folder.file("kept"), slc.measurement());
+    EXPECT_EQ(import_safe(slc.path(), folder.file("none/scene"), result), 9);
+    EXPECT_EQ(result.message, folder.file("none/scene") + ": cannot be written: No such file or directory");
+    test::write_text(slc.measurement(), "none");
+    EXPECT_EQ(import_safe(slc.path(), folder.file("scene"), result), 1);
+    EXPECT_EQ(std::string{result.message}.rfind(slc.measurement()), 0U) << result.message;
     grd.change("<numberOfSamples>26102<", "<numberOfSamples>1<");
     try {
         (void)described(grd);
