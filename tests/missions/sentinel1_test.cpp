@@ -427,7 +427,7 @@ struct Cut {
     const char *name, *safe;
     int lines, samples;  // of the whole
     RasterDerivation how;
-    int cut_lines, cut_samples;
+    int cut_lines, cut_samples, bursts;
 };
 class Cuts : public testing::TestWithParam<Cut> {};
 
@@ -467,6 +467,12 @@ TEST_P(Cuts, KeepTheTimesOfTheirPixels) {
     ASSERT_EQ(product.GSread((part + ".hdr").c_str()), 0);
     EXPECT_STREQ(product.dataSetInfo.SceneID, safe.annotation().stem().c_str());
     const ROI_Obj& region = product.roi.Roi;
+    EXPECT_EQ(of_part.Bursts, cut.bursts);
+    EXPECT_EQ(product.swathInfo.Bursts, cut.bursts);
+    EXPECT_EQ(product.swathInfo.Lines_per_burst, cut.bursts > 0 ? 4 : 0);
+    EXPECT_EQ(product.swathInfo.Acquisition_Start_Time, region.SlowStartTime);
+    EXPECT_LE(product.spectralWindows.RgLookBandwidth, product.samplingConstants.frg_hz);
+    EXPECT_LE(product.dataSetInfo.RangeBandwidth[0], product.samplingConstants.frg_hz);
     for (const double line : {0.0, cut.cut_lines - 1.0})
         for (const double sample : {0.0, cut.cut_samples - 1.0}) {
             const double there_line = cut.how.first_line + line * cut.how.line_step,
@@ -485,13 +491,15 @@ TEST_P(Cuts, KeepTheTimesOfTheirPixels) {
                             2e-3);
         }
 }
-INSTANTIATE_TEST_SUITE_P(Sentinel1, Cuts,
-                         testing::Values(Cut{"Bursts", kSlc, 12, 300, {5.0, 100.0, 1.0, 1.0}, 6, 150},
-                                         Cut{"WithinABurst", kSlc, 12, 300, {5.0, 0.0, 1.0, 1.0}, 2, 300},
-                                         Cut{"FinerSamples", kSlc, 12, 300, {0.0, 0.0, 1.0, 0.5}, 12, 600},
-                                         Cut{"GroundRange", kGrd, 4, 26102, {1.0, 13000.0, 1.0, 1.0}, 2, 1000},
-                                         Cut{"CoarserGround", kGrd, 4, 26102, {0.0, 6000.0, 2.0, 4.0}, 2, 5000}),
-                         [](const auto& test) { return std::string{test.param.name}; });
+INSTANTIATE_TEST_SUITE_P(
+    Sentinel1, Cuts,
+    testing::Values(Cut{"Bursts", kSlc, 12, 300, {5.0, 100.0, 1.0, 1.0}, 6, 150, 2},
+                    Cut{"WithinABurst", kSlc, 12, 300, {5.0, 0.0, 1.0, 1.0}, 2, 300, 0},
+                    Cut{"FinerSamples", kSlc, 12, 300, {0.0, 0.0, 1.0, 0.5}, 12, 600, 3},
+                    Cut{"CoarserSamples", kSlc, 12, 300, {0.0, 0.0, 1.0, 2.0}, 12, 150, 3},
+                    Cut{"GroundRange", kGrd, 4, 26102, {1.0, 13000.0, 1.0, 1.0}, 2, 1000, 0},
+                    Cut{"CoarserGround", kGrd, 4, 26102, {0.0, 6000.0, 2.0, 4.0}, 2, 5000, 0}),
+    [](const auto& test) { return std::string{test.param.name}; });
 
 TEST(CommitDerived, RefusesAndLeavesNothing) {
     const test::Report report;
