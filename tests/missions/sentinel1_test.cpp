@@ -50,6 +50,29 @@ std::unique_ptr<quo::MissionProduct> described(const Safe& safe, const std::stri
     return made;
 }
 
+/** An orbit file of the annotation's own vectors, so many metres off in x. */
+std::string orbit_beside(const Safe& safe, const test::TemporaryFolder& folder, double off_m) {
+    std::string list;
+    const quo::MissionXml xml{safe.annotation().string()};
+    for (const auto& orbit : xml.root().list("generalAnnotation/orbitList", "orbit")) {
+        list += "<OSV><UTC>UTC=" + orbit.text("time") + "</UTC>";
+        for (const char* const axis : {"x", "y", "z"}) {
+            const std::string name{static_cast<char>(axis[0] - 'x' + 'X')}, lower{axis};
+            const double at_m = orbit.number("position/" + lower) + (lower == "x" ? off_m : 0.0);
+            list.append("<").append(name).append(">").append(std::to_string(at_m));
+            list.append("</").append(name).append("><V").append(name).append(">");
+            list.append(orbit.text("velocity/" + lower)).append("</V").append(name).append(">");
+        }
+        list += "</OSV>";
+    }
+    test::write_text(folder.file("own.EOF"),
+                     "<E><Earth_Explorer_Header><Fixed_Header><Mission>Sentinel-1A</Mission></Fixed_Header>"
+                     "<Variable_Header><Ref_Frame>EARTH_FIXED</Ref_Frame></Variable_Header>"
+                     "</Earth_Explorer_Header><Data_Block><List_of_OSVs>" +
+                         list + "</List_of_OSVs></Data_Block></E>");
+    return folder.file("own.EOF");
+}
+
 // --- Times and tie points ---------------------------------------------------------------------------------------
 
 TEST(Sentinel1, TakesTimesToTheMicrosecond) {
@@ -200,12 +223,8 @@ TEST(Sentinel1, RefusesBurstsThatContradictTheImage) {
 TEST(Sentinel1, KeepsTheDelayUnderAnotherOrbit) {
     const test::Report report;
     const test::TemporaryFolder folder;
-    Safe safe{folder, kSlc};
-    // The minutes of the orbit file's vectors.
-    for (const auto& [from, to] :
-         {std::pair{"17:04", "14:11"}, {"17:05", "14:12"}, {"17:06", "14:13"}, {"17:07", "14:14"}})
-        safe.change(std::string{"2022-01-04T"} + from, std::string{"2023-08-23T"} + to);
-    const auto own = described(safe), other = described(safe, kOrbit);
+    const Safe safe{folder, kSlc};
+    const auto own = described(safe), other = described(safe, orbit_beside(safe, folder, 90.0));
     EXPECT_EQ(own->grid.DelayShare, 0.5);
     EXPECT_EQ(own->grid.DelayReference_s, other->grid.DelayReference_s);
     EXPECT_NE(own->header.orbit.pSV_m[0], other->header.orbit.pSV_m[0]);
@@ -659,7 +678,7 @@ TEST(Sentinel1, NeverReplacesTheProductsOwnFiles) {
 
 TEST(Sentinel1, TakesAnOrbitFileThatFits) {
     const test::Report report;
-    const test::TemporaryFolder folder;
+    const test::TemporaryFolder folder, folder_of_own;
     Safe safe{folder, kSlc};
     safe.shrink(false);
     write_tiff(safe.measurement(), kPlain, 40, 30, true);
@@ -676,6 +695,15 @@ TEST(Sentinel1, TakesAnOrbitFileThatFits) {
     EXPECT_EQ(orbit.nSV_n, 8);  // from 40 s before the image to 40 s after it
     EXPECT_EQ(orbit.t0SV_s, 1219414283.657814);
     EXPECT_EQ(orbit.dtSV_s, 10.0);
+    // The annotation's own orbit, moved.
+    Safe own{folder_of_own, kSlc};
+    own.shrink(false);
+    write_tiff(own.measurement(), kPlain, 40, 30, true);
+    for (const auto& [off_m, status] : {std::pair{110.0, 1}, {90.0, 0}})
+        EXPECT_EQ(
+            import_safe(own.path(), folder.file("scene"), result, orbit_beside(own, folder_of_own, off_m).c_str()),
+            status)
+            << result.message;
     const test::TemporaryFolder other;
     const Safe grd{other, kGrd};
     write_tiff(grd.measurement(), {"", 16, SAMPLEFORMAT_UINT, COMPRESSION_LZW, true, false, 0}, 16705, 26102,
