@@ -302,7 +302,8 @@ TEST_P(Modes, AreTakenOverByWhatTheAnnotationHas) {
     EXPECT_EQ(product.dataSetInfo.RangeBandwidth[4] > 0.0, grd);
 
     // A second annotation like it, such as the next vignette's, can only be told by its name.
-    fs::copy(safe.annotation(), test::replaced(safe.annotation().string(), "00", "09"));
+    fs::copy(safe.annotation(),
+             safe.annotation().parent_path() / test::replaced(safe.annotation().filename().string(), "00", "09"));
     EXPECT_EQ(import_safe(safe.path(), folder.file("scene"), result), 1);
     EXPECT_NE(std::string{result.message}.find("2 annotations of this swath and polarization; name one of them"),
               std::string::npos)
@@ -439,6 +440,40 @@ INSTANTIATE_TEST_SUITE_P(
                     Layout{"DetectedStrips", 16, SAMPLEFORMAT_UINT, COMPRESSION_NONE, false, false, 1},
                     Layout{"DetectedTiles", 16, SAMPLEFORMAT_UINT, COMPRESSION_LZW, true, true, 0}),
     [](const auto& test) { return std::string{test.param.name}; });
+
+// A strip of the whole image was unpacked at once, and its samples widened beside it.
+TEST(Sentinel1, TakesLongStripsInParts) {
+    const test::Report report;
+    for (const bool packed : {false, true})
+        for (const bool big_endian : {false, true}) {
+            const test::TemporaryFolder folder;
+            Safe safe{folder, kGrd};
+            safe.change("<numberOfLines>16705<", "<numberOfLines>43<");
+            write_tiff(safe.measurement(),
+                       {"", 16, SAMPLEFORMAT_UINT, std::uint16_t{packed ? COMPRESSION_LZW : COMPRESSION_NONE},
+                        false, big_endian, 43},
+                       43, 26102, true);
+            const std::string source = safe.path(), raster = folder.file("scene");
+            int told = 0;
+            quo_import_request request{};
+            request.source = source.c_str();
+            request.raster = raster.c_str();
+            request.context = &told;
+            request.progress = [](void* context, std::int64_t, std::int64_t) {
+                ++*static_cast<int*>(context);
+                return 0;
+            };
+            quo_import_result result{};
+            ASSERT_EQ(quo_import_sentinel1(&request, &result), 0) << result.message;
+            EXPECT_GE(told, 4);
+            const std::string bytes = test::read_text(raster);
+            std::vector<std::int32_t> values(std::size_t{43} * 26102);
+            ASSERT_EQ(bytes.size(), values.size() * sizeof values[0]);
+            std::memcpy(values.data(), bytes.data(), bytes.size());
+            for (std::uint32_t i = 0; i < values.size(); ++i)
+                ASSERT_EQ(values[i], static_cast<std::uint16_t>(part_of(i / 26102, i % 26102, 0))) << i;
+        }
+}
 
 // --- Cuts and other samplings -----------------------------------------------------------------------------------
 
