@@ -449,10 +449,11 @@ TEST(Sentinel1, TakesLongStripsInParts) {
             const test::TemporaryFolder folder;
             Safe safe{folder, kGrd};
             safe.change("<numberOfLines>16705<", "<numberOfLines>43<");
-            write_tiff(safe.measurement(),
-                       {"", 16, SAMPLEFORMAT_UINT, std::uint16_t{packed ? COMPRESSION_LZW : COMPRESSION_NONE},
-                        false, big_endian, 43},
-                       43, 26102, true);
+            write_tiff(
+                safe.measurement(),
+                {"", 16, SAMPLEFORMAT_UINT,
+                 static_cast<std::uint16_t>(packed ? COMPRESSION_LZW : COMPRESSION_NONE), false, big_endian, 43},
+                43, 26102, true);
             const std::string source = safe.path(), raster = folder.file("scene");
             int told = 0;
             quo_import_request request{};

@@ -248,6 +248,7 @@ TEST_P(Imported, MakesAnItemThatItsSchemasAllow) {
     const auto made = test::quo({"stac", raster()});
     ASSERT_EQ(made.exit_status, 0) << made.err;
     const json item = json::parse(made.out);
+    EXPECT_EQ(json::parse(test::quo({"stac", raster(), "--id", "mine"}).out)["id"], "mine");
     for (const auto& [path, fits] : kRules) {
         const json::json_pointer place{path};
         ASSERT_TRUE(item.contains(place)) << path;
