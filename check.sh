@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Installs what is missing, builds, and runs all tests: in the release; under the sanitizers, compiled by clang (what
 # threads do at the same time under one of its own); the fuzz targets for a few seconds each; and the checks of format
 # and style. A second call builds and analyses only what has changed.

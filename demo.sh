@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Installs what is missing, builds the release and runs the main job on the bundled real scenes.
 set -eu
 cd "$(dirname "$0")"

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // What diagnostics cost while all goes well: a call frame beside a bare call, tracked allocation beside the
 // system's.
 

@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # The tool as its users run it, beside the system's own.
 if(TARGET quo)
     quo_bench(convert SOURCES convert_bench.cpp COMPONENTS datafile)

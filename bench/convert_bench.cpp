@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // `quo convert` of a raster beside `cp` of the same file. Wall clock times of whole programs, the start of the
 // process included; a new raster is on the disk when the tool comes back, and a copy where `sync` waited for it.
 #include <chrono>

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Images of several shapes through the library's plans beside the batched plans of FFTW (measured): by our own
 // kernels, by FFTW where the length has another prime factor; by MKL beside MKL where it is installed. Columns
 // beside moving them into a tile and out; zero-padding row by row beside FFTW over the whole image; making a plan,

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* What one point, one choice, one polynomial and one value cost as their number grows, each beside the same where
  * there are few. */
 

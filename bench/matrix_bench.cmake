@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # The reference one, whatever else is installed.
 set(BLA_VENDOR Generic)
 find_package(LAPACK REQUIRED)

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Inversion beside LAPACK, polynomial and linear fits beside a straightforward solution with Eigen, in one run.
 // The summary at the end prints the ratios.
 #include <benchmark/benchmark.h>

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Numbers as text beside the C library in one run: "%.15g" beside snprintf, reading beside strtod. Half of the
 // numbers are as products hold them, half are any bit pattern. The summary at the end prints the ratios; a time is
 // that of all the numbers.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* A whole product beside libxml2 alone: GSread beside a parse with a walk over every node, GSwrite beside building
  * the same tree and saving it. The product has 100 state vectors and six lists of polynomials; their number is the
  * argument, so that the growth shows too. */

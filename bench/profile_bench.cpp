@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* Parameter files of 1 MB with 10,000 keys and of 10 MB with 100,000: loading and look-up must cost the same per
  * key in both, which the first ratios show. The floors: reading the same bytes and copying every name and value
  * once, and a plain hash table of the same keys. */

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 quo_bench(raster SOURCES raster_bench.cpp COMPONENTS datafile)
 # GDAL as a peer, where its headers are installed (libgdal-dev).
 find_package(GDAL QUIET)

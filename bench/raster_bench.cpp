@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Blocks of 512 lines x 8192 samples from and to the page cache, beside bare pread and pwrite of the same bytes
 // and, where its headers are installed, beside GDAL; and small buffered reads beside memcpy.
 #include <benchmark/benchmark.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_BENCH_RATIO_REPORTER_H
 #define QUO_BENCH_RATIO_REPORTER_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_BENCH_TEMPORARY_FOLDER_H
 #define QUO_BENCH_TEMPORARY_FOLDER_H
 

@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # The tool and the example programs as their users run them.
 if(TARGET quo AND TARGET processor)
     quo_bench(threads SOURCES threads_bench.cpp COMPONENTS orbit)

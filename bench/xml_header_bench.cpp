@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* Header documents beside libxml2 alone: reading one array of doubles beside a parse and a walk over its elements,
  * writing one beside building the same tree by hand and saving it once, and a product of many objects beside one.
  */

@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # The library is built from components, each an object library that links only what lies on its own floor or below.
 # The shared library is linked from all of them; a unit test links the objects of its component and of everything
 # below it, so that private helpers can be tested.

@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # What is installed, in components: runtime (the library, the modules that it loads, and the licence), development
 # (headers, CMake package, pkg-config file, documentation and examples), tools (the command-line tool, its manual pages
 # and completion), python (the package for Debian's Python) and, only where it is asked for, wheel (the same with the

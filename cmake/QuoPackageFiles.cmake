@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # Run on the staged files before they are packed: what a Debian package holds beside the installed files.
 find_program(GZIP gzip REQUIRED)
 foreach(component IN LISTS CPACK_COMPONENTS_ALL)

@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # Debian packages, one for each installed component: cpack -G DEB --config BUILD_FOLDER/CPackConfig.cmake
 set(CPACK_PACKAGE_NAME quo_base)
 set(CPACK_PACKAGE_VERSION ${PROJECT_VERSION})

@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Lets the links of a package's documents hold in the installed system: what another package has is there, and what only
 # the sources have is named without a link.
 # Usage: package_links.sh STAGE PACKAGE

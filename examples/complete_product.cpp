@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Builds a whole product on the header of a real scene, as a processor would: all fourteen header objects and a
 // raster that shows where the meridians and parallels run. Then reads it back and compares every value. Usage:
 // example_complete_product SCENE.xml RASTER

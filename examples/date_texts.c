@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* The plain functions are C functions: they serve C programs, and every language that can load a C library. */
 #include <stdio.h>
 

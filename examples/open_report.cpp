@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Opens a report, and asks for a product that is not there.
 #include "quo_base/ckerr.h"
 #include "quo_base/product.h"

@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # Fails when README does not hold the example word for word, its licence line apart.
 file(READ "${README}" readme)
 file(READ "${EXAMPLE}" example)

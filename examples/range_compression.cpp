@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Compresses the echo of a point target and compares the result with theory.
 #include <algorithm>
 #include <cmath>

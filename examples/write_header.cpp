@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Builds a product header from scratch: five state vectors, the sampling, and the numbers exactly as they are.
 #include <cstdio>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_FUZZ_BYTES_H
 #define QUO_FUZZ_BYTES_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* Polynomials and coregistration, from headers and parameter files of any bytes. */
 
 #include <algorithm>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* Numbers and dates of any text against the C library. */
 
 #include <clocale>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* Headers of whole products: what is read is located, written, and read back the same. */
 
 #include <cmath>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* Parameter files, and values of them, from any bytes. */
 
 #include <cstddef>

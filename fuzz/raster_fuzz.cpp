@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "raster_property.h"
 
 /* The first byte chooses between blocks of a raster and a side file. */

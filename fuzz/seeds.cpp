@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* Runs one target on the seeds in a folder, where no fuzzer is linked. */
 
 #include <cstddef>

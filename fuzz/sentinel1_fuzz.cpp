@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* Imports of annotations, measurements and orbit files of any bytes: taken over whole, or refused with a line and
  * nothing left behind. Before the first line feed stand the lengths of the annotation and the measurement. */
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* Tables of any bytes: the rows one by one are those of the blocks, and fields joined are the line again. */
 
 #include "bytes.h"

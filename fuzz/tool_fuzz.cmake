@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # The verbs that need no product, and what they stand on.
 if(NOT TARGET quo_command_line)
     add_subdirectory("${PROJECT_SOURCE_DIR}/examples/common" command_line)

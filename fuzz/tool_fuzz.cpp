@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* Command lines and dumps of any bytes, as the tool takes them. The first line is split at its tabs into the words
  * of a command line, "@" among them standing for a file that holds the rest. Jobs of verbs that only read are
  * done. */

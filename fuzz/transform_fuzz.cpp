@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* Transforms of any shape against the sum that defines them, in double precision. */
 
 #include <cmath>

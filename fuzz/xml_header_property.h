@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_XML_HEADER_PROPERTY_H
 #define QUO_XML_HEADER_PROPERTY_H
 

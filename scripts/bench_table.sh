@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Runs the benchmark programs of a build and prints their ratios as one table in Markdown. Programs that are not
 # built are left out; arguments after the folder name those to run, without "_bench".
 # Usage: scripts/bench_table.sh BUILD_FOLDER [NAME...]

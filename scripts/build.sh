@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Configures and builds one preset, quietly: output is shown only when something fails.
 # Usage: scripts/build.sh PRESET [TARGET...]
 set -eu

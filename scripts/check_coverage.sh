@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Runs the tests over a library that counts what ran, and fails where less than 97 % of its lines or 87 % of its
 # branches did. Branches that only an exception takes are left out, for the compiler puts one behind every call; so are
 # the tests that counting disturbs, and of those that let system calls fail the tool's and the longest: each of their

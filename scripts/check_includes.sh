@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Fails where a file of the library includes something of a component that its own does not stand on: the floors are what
 # DEPENDS says. Of private headers the compiler tells too, of public ones only this.
 # Usage: scripts/check_includes.sh BUILD_FOLDER

@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Kills processes that save a header, a parameter file, a raster with its description, a picture and, where the Python
 # package is built, a map, over and over, at any moment: each file is then old or new, and the next save sweeps what was
 # left.

@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Reads, changes and converts files of 100 MB in processes whose address space ends at 8 times that, and tells what each
 # took: a header with a long section, a table, a raster, and a parameter file with as much in it as beside it. A job
 # fails the check when it fails, or ends by a signal.

@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Runs clang-tidy on one source, or on one that includes several; a finding fails. It is looked at again only when one of
 # them, a header or the configuration has changed since it was last found clean.
 # Usage: scripts/check_tidy.sh BUILD_FOLDER FILE

@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Runs the demo's chain under valgrind, reduced to one target with a narrow beam and a short pulse. Fails on invalid
 # accesses, on blocks that nobody holds any more, and on file descriptors that a program left open. Transforms run on
 # FFTW, and then on the own engine with the instructions that valgrind knows of every processor: MKL keeps blocks in ways

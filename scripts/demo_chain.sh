@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Part of the main job: the chain from echoes to a geolocated image. Simulates, focuses, measures and shows.
 # Usage: scripts/demo_chain.sh BUILD_FOLDER
 set -eu

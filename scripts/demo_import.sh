@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Part of the main job: a Sentinel-1 sub-swath taken over. The annotation is a real one, cut down to three bursts; the
 # measurement is made, of its size.
 # Usage: scripts/demo_import.sh BUILD_FOLDER

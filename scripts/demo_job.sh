@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # The main job: geolocates the bundled real scenes and compares the result with what their producers state.
 # Usage: scripts/demo_job.sh BUILD_FOLDER; it and its parts write below demo-output in the current folder
 set -eu

@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Part of the main job: a complete product, written and read back, and what the tool tells of it.
 # Usage: scripts/demo_product.sh BUILD_FOLDER
 set -eu

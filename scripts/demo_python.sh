@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Part of the main job: the focused image of the chain as a map, by the Python package.
 # Usage: scripts/demo_python.sh BUILD_FOLDER
 set -eu

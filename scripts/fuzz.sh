@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Builds the fuzz targets and runs them one after the other from their seeds, for so many minutes in all; 0.5 is a quick
 # look. Fails for a target that crashes, leaks or hangs, and for one whose coverage does not grow beyond that of its
 # seeds in half a minute: it would be looking at nothing. An input that was found to fail is kept in build/found.

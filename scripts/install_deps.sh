@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Installs the Debian packages that building and testing need. Quick and silent when nothing is missing.
 # Usage: scripts/install_deps.sh [--demo | --with-mkl]
 # --demo leaves out what only tests need.

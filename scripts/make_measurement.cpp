@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Makes the measurement that belongs to the annotation of a Sentinel-1 SLC: a TIFF of the size and place that
 // the annotation tells, with a made landscape in place of the samples. Parallels and meridians at every tenth of a
 // degree run through it, so that pictures tell whether they lie right. Usage: make_measurement

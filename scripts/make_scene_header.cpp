@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Makes the product header of a scene from its facts, with the library's own writers.
 // Usage: make_scene_header SCENE_facts.json SCENE.xml
 

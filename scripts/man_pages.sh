@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Makes the manual pages from the tool's own help: quo.1, and a page for each of its verbs.
 # Usage: scripts/man_pages.sh QUO OUTPUT_FOLDER
 set -eu

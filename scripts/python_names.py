@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Prints docs/python_names.md: every name of the Python package with the first sentence of its documentation.
 
 Usage: PYTHONPATH=build/release/python /usr/bin/python3 scripts/python_names.py > docs/python_names.md
@@ -19,6 +20,8 @@ Every name of the package, as its own documentation begins; `help()` has the res
 
 
 def sentence(thing):
+    if isinstance(thing, dict):
+        return "One of: " + ", ".join(thing)
     text = " ".join((inspect.getdoc(thing) or "").split("\n\n")[0].split()).replace("|", "\\|").replace("`", "")
     return re.match(r"(.*?)(?:\.(?= [A-Z])|[.:;]?$)", text)[1]
 

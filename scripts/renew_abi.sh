@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Writes the signatures of the plain functions and the layouts of the types in the public headers into
 # tests/abi/quo_base.abi.gz, or another file. A small library with a pointer to each of them, compiled here, tells them
 # all: the real one would have to be built anew with debugging information. What methods take is in their exported names.

@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Writes the names that the built library exports into tests/abi/exported_symbols.txt, or another file. A name that
 # goes breaks programs that are linked already: then SOVERSION in libsrc/CMakeLists.txt rises.
 # Usage: scripts/renew_exported_symbols.sh BUILD_FOLDER [FILE]

@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # Builds the reference documentation. Fails on anything that Doxygen finds wrong or undocumented, and on an example
 # that the documentation leaves out.
 # cmake -D DOXYGEN=... -D DOXYFILE=... -D EXAMPLES=folder -P reference.cmake

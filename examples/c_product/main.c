@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* A product from C: who made it, where a sample lies on the ground, when that place is seen, and a block of the
  * raster where there is one. Usage: product HEADER AZIMUTH_S RANGE_S; the result is the status of what failed. */
 #include <stdio.h>

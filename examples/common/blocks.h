@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_EXAMPLE_BLOCKS_H
 #define QUO_EXAMPLE_BLOCKS_H
 

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Makes raw radar data of point targets as a sensor in a real orbit would record it.
 #include <cstdio>
 #include <string>

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Measures point targets in a focused image: position, resolution, sidelobes, phase.
 #include <algorithm>
 #include <cstdio>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_EXAMPLES_MEASURE_H
 #define QUO_EXAMPLES_MEASURE_H
 

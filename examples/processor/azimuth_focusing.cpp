@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "azimuth_focusing.h"
 
 #include <algorithm>

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // A small range-Doppler processor for stripmap data.
 #include <algorithm>
 #include <cstdio>

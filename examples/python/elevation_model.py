@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """An elevation model of the sea with an island under each place of a list: heights above the ellipsoid.
 
 Usage: elevation_model.py PLACES.csv DEM.tif

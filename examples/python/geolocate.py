@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Where the corners and the middle of an image lie on the ground, and how they are seen.
 
 Usage: geolocate.py HEADER [HEIGHT_M]

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Mean power of a raster along its samples, in blocks of lines so that rasters of any size fit into memory.
 
 Usage: line_profile.py HEADER [LINES_OF_A_BLOCK]

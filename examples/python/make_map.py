@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """A picture of an image on the map, and of the surroundings of known places, which should be bright in the middle.
 
 The elevation model's heights are above the ellipsoid. Places are a list with the columns name, latitude_deg,

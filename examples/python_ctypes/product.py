@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """A product from Python with the standard library alone: ctypes loads the shared library and calls its C functions.
 
 Usage: product.py LIBRARY HEADER AZIMUTH_S RANGE_S

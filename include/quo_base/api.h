@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_BASE_API_H
 #define QUO_BASE_API_H
 

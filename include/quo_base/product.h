@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_BASE_PRODUCT_H
 #define QUO_BASE_PRODUCT_H
 
@@ -45,8 +46,8 @@ typedef struct quo_product quo_product;
  *                      appended; null for the one that the header describes, whose name is the header's less its
  *                      last four characters. A header may describe none.
  * @param[out] product  the handle, to be given back to quo_product_close()
- * @return 1 also for a header that holds no object of a product, and for a raster without a complete description; 7;
- *         9 for a header that cannot be opened. That the raster is there is not asked before it is read. */
+ * @return 1 also for a header that holds no object of a product, and for a raster without a complete description;
+ * 7; 9 for a header that cannot be opened. That the raster is there is not asked before it is read. */
 QUO_BASE_API int quo_product_open(const char* header, const char* raster, quo_product** product) QUO_NOEXCEPT;
 
 /** Closes a product; its handle is none from then on. */

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """How far the orbit model lies from exact and from precise state vectors, and whether the way forth and back closes.
 
 Usage: accuracy.py

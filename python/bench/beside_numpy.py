@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Geolocation beside the same equations in numpy's own arithmetic: zero Doppler on the curve through five vectors.
 
 Usage: beside_numpy.py

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Array calls, raster slices and the import beside the same without the package, as ratios.
 
 The calls of the library are made by ctypes, on the same arrays, in this process.

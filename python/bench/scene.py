@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """What the benchmarks measure on: a part of a real scene with made samples, and flat terrain under it."""
 
 import time

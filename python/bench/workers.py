@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """A map on one and on two workers, what a tile costs beside its work, and what travels and stays in memory.
 
 Usage: workers.py

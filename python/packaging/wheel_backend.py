@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Makes the wheel of the package, with the library and its modules inside, for `pip install ./python`.
 
 The library is built in build/wheel beside the sources. `pip install --config-settings folder=BUILD` packs what was

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Radar products: headers, orbits and geolocation, rasters, polynomials, signal processing and time."""
 
 from ._calls import hide_signatures

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Arrays as the bindings take them: float64, C-contiguous, aligned, of one shape."""
 
 from __future__ import annotations

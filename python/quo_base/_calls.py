@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Calls of the bindings that tell a wrong argument without their own signatures, which are none of the package's."""
 
 from __future__ import annotations

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """The library's calls, as the package needs them: arrays C-contiguous, aligned and of the very type."""
 
 from collections.abc import Callable, Sequence

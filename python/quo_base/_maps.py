@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Maps under geocode(): their grids, the terrain, and what the radar sees of it."""
 
 from __future__ import annotations

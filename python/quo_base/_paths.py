@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Names of files as the library takes them."""
 
 from __future__ import annotations

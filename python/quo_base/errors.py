@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Exceptions of the package: each carries the library's status and what it wrote into its report."""
 
 from __future__ import annotations

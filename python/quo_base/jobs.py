@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Many products at a time: outputs that appear whole or not at all, on one machine or a cluster."""
 
 from __future__ import annotations

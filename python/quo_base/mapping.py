@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Terrain-corrected maps: images on the grid of an elevation model, or on one that is asked for."""
 
 from __future__ import annotations

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Header objects that stand by themselves: regions, polynomials, coregistration, records of processors."""
 
 from __future__ import annotations

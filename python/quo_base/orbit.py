@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Orbits: where the platform flies, and geolocation of arrays of points."""
 
 from __future__ import annotations

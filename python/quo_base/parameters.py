@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Parameter files of sections and keys."""
 
 from __future__ import annotations

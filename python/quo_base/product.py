@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Products: header objects and fields under their own names, the orbit, the raster, the pixel grid."""
 
 from __future__ import annotations

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Rasters: slices of files as numpy arrays, and new rasters."""
 
 from __future__ import annotations

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Sentinel-1 products, taken over as products of the library."""
 
 from __future__ import annotations

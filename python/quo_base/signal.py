@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Fourier transforms in single precision, chirp-z transform, resampling, and least squares."""
 
 from __future__ import annotations

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Times: seconds since 1 January 1985 without leap seconds, as the library counts them, and numpy's datetime64."""
 
 from __future__ import annotations

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Products as data sets: `xarray.open_dataset("scene.hdr", engine="quo_base")`."""
 
 from __future__ import annotations

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_PYTHON_ERRORS_H
 #define QUO_PYTHON_ERRORS_H
 

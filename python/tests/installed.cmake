@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # Installs the package by pip into an empty environment that sees the system's numpy, and runs tests with what stands
 # there, nothing of which may come from the build folder: transforms need the library's module, data sets the metadata.
 include("${SOURCE}/tests/support/run.cmake")

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Maps and jobs: places against the array calls, terrain against its geometry, outputs whole or absent."""
 
 import os

@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Compares the names that the library exports with the list that stands beside this script.
 # Usage: exported_symbols.sh BUILD_FOLDER WORK_FOLDER
 set -eu

@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Compares signatures and layouts with those of the reference beside this script: functions and types may be added.
 # Usage: layouts.sh WORK_FOLDER
 set -eu

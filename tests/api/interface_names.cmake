@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # Fails on every name of interface_names.txt that its header does not declare, or that the library does not export.
 # cmake -D HEADERS=folder -D LIBRARY=file -D NM=program -P interface_names.cmake
 cmake_minimum_required(VERSION 3.25)

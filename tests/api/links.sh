@@ -1,4 +1,6 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
+#
 # Fails for a link of a document in a folder that leads nowhere.
 # Usage: links.sh FOLDER
 set -eu

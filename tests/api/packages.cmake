@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # Packs what was built into Debian packages, unpacks them into a fresh root, and builds and runs small outside
 # projects against that: with find_package, with pkg-config, and loading the library at run time.
 include("${CMAKE_CURRENT_LIST_DIR}/../support/run.cmake")

@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # Builds the chain's programs against an installed package, as a user would, and asks one for its help.
 include("${CMAKE_CURRENT_LIST_DIR}/../support/run.cmake")
 

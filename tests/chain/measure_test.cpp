@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Responses at known pixels of images of every kind of grid: the targets lie where the orbit takes the pixels'
 // times.
 #include "point_targets/measure.h"

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // The picture of a target: what is measured must be drawn where the axes say.
 #include "point_targets/portrait.h"
 

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Every pair of cell type and memory type, in rasters of different layouts, against the rules told one by one.
 
 #include "datafilelib/kernel_table.h"

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Runs the sessions of data/rasters/sessions.txt.
 #include "support/session.h"
 

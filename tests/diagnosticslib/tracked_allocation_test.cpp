@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "tracking.h"
 
 // Requests beyond all memory are refused with null under the address sanitizer too, as by the system.

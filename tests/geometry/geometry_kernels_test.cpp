@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "sarutillib/geometry/geometry_kernels.h"
 
 #include "support/geometry.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "quo_base/gr_pt.h"
 
 #include "quo_base/geometry.h"

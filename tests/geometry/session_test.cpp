@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Runs the sessions of data/geometry/sessions.txt.
 #include "quo_base/interp_orb.h"
 #include "support/plain_calls.h"

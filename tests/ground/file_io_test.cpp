@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "sarutillib/ground/file_io.h"
 
 #include <grp.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "quo_base/gen_utils.h"
 #include "sarutillib/ground/file_io.h"
 #include "support/diagnostics.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "sarutillib/ground/processor_level.h"
 
 #include <gtest/gtest.h>

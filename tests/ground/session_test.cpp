@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Runs the sessions of data/ground/sessions.txt.
 #include "quo_base/gen_utils.h"
 #include "sarutillib/ground/gen_utils_dates.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "objects/records.h"
 #include "support/diagnostics.h"
 #include "support/raster.h"

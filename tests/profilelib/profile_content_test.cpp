@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "profilelib/profile_content.h"
 
 #include "profile_property.h"

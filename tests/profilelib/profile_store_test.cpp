@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "profile_property.h"
 #include "quo_base/profile.h"
 #include "support/diagnostics.h"

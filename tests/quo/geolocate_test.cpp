@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // The verbs whose geometry has a truth from outside.
 #include <gtest/gtest.h>
 

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // What files, disks and users can do to the verbs that read rasters or write files.
 #include <fcntl.h>
 #include <gmock/gmock.h>

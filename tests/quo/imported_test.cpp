@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // What the tool makes of products of a mission, and of one with the lines of a map in it.
 #include <gtest/gtest.h>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_TESTS_QUO_RASTER_FOLDER_H
 #define QUO_TESTS_QUO_RASTER_FOLDER_H
 

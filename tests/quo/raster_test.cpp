@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // The verbs on rasters, each against bytes made here.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>

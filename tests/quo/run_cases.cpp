@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Runs the transcripts of cases/: what a user types, and what the tool answers.
 //
 //   == title          begins a case, in a fresh folder where its commands run

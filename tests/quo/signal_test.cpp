@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // The verbs on signals: what they measure and make must be what was put in.
 #include <gtest/gtest.h>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "quorelxmllib/legacy_list.h"
 
 #include <locale.h>

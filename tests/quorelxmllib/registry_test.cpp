@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "header_files.h"
 #include "quo_base/quorelxml_v2.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "header_files.h"
 #include "shelf.h"
 #include "xml_header_property.h"

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Runs the sessions of data/headers/sessions.txt.
 #include "header_files.h"
 #include "quorelxmllib/legacy_list.h"

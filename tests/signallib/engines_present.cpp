@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Says which FFT engines this machine has, and so which of them the tests of the transforms run with.
 #include <cstdio>
 #include <cstdlib>

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Stands in for libmkl_rt where the MKL engine is tested: the same calls, carried out by direct transforms in
 // double precision. What is set is kept as MKL keeps it, and an odd sequence of calls is refused as MKL refuses
 // it.

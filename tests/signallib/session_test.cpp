@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Runs the sessions of data/signals/sessions.txt: what plans and resampling refuse.
 #include "support/session.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_TESTS_SUPPORT_SENTINEL1_H
 #define QUO_TESTS_SUPPORT_SENTINEL1_H
 

@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+
 # bash completion for quo: verbs, options and their values as its own help tells them, then file names.
 _quo() {
     local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]} command=(quo) help verbs words

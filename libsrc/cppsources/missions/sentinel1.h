@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_SENTINEL1_H
 #define QUO_SENTINEL1_H
 

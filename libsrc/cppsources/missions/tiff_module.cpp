@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // The module that holds libtiff: measurements as missions deliver them. A library of its own, so that only who
 // imports loads libtiff and the compression libraries below it.
 #include <tiffio.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_ELEMENT_CHOICE_H
 #define QUO_ELEMENT_CHOICE_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_LEGACY_LIST_H
 #define QUO_LEGACY_LIST_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "quorelxmllib/xml_text.h"
 
 #include <libxml/tree.h>

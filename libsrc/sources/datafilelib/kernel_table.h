@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_KERNEL_TABLE_H
 #define QUO_KERNEL_TABLE_H
 

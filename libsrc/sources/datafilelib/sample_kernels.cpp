@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "datafilelib/sample_kernels.h"
 
 #include "datafilelib/kernel_table.h"

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Compiled with AVX2 switched on.
 #include <cstdint>
 #include <type_traits>

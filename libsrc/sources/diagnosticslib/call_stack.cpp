@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "diagnosticslib/call_stack.h"
 
 #include <unistd.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_ERRNO_KEPT_H
 #define QUO_ERRNO_KEPT_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_REPORT_H
 #define QUO_REPORT_H
 

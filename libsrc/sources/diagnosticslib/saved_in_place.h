@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_SAVED_IN_PLACE_H
 #define QUO_SAVED_IN_PLACE_H
 

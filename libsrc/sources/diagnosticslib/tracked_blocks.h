@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_TRACKED_BLOCKS_H
 #define QUO_TRACKED_BLOCKS_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "matrixlib/dense_kernels.h"
 
 namespace quo::dense_any {

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Compiled with AVX-512 and fused multiplication switched on.
 #include "matrixlib/dense_kernels.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_MATRIX_KERNELS_H
 #define QUO_MATRIX_KERNELS_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_INDEX_TABLE_H
 #define QUO_INDEX_TABLE_H
 

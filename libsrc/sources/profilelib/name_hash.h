@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_NAME_HASH_H
 #define QUO_NAME_HASH_H
 

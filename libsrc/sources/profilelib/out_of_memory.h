@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_OUT_OF_MEMORY_H
 #define QUO_OUT_OF_MEMORY_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_PROFILE_CONTENT_H
 #define QUO_PROFILE_CONTENT_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_FFT_ENGINE_H
 #define QUO_FFT_ENGINE_H
 

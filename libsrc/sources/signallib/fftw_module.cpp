@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // The module that holds FFTW: transforms by its single-precision library, linked into it and hidden. A library of
 // its own, because others export functions of the same names, and to keep FFTW's licence out of the core.
 #include <fftw3.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_IMAGE_SIZE_H
 #define QUO_IMAGE_SIZE_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_MEMORY_ROOM_H
 #define QUO_MEMORY_ROOM_H
 

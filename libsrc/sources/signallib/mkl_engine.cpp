@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Transforms by DFTI, looked up in libmkl_rt at run time.
 #include <dlfcn.h>
 

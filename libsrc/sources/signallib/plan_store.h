@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_PLAN_STORE_H
 #define QUO_PLAN_STORE_H
 

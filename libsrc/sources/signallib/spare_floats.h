@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_SPARE_FLOATS_H
 #define QUO_SPARE_FLOATS_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* A C11 program against the installed package: plain functions of several components, and the trio family. */
 #include <math.h>
 #include <stdio.h>

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // A C++ program against the installed package: writes a header object and reads it back.
 #include <string>
 

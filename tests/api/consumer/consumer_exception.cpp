@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // A C++ program against the installed package that hides its own symbols: exceptions of the library are caught by
 // their type, and its own ones are known to the library.
 #include <cstring>

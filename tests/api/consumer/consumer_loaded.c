@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* A C11 program that knows the library by its file name only, as other languages load it. */
 #include <dlfcn.h>
 #include <string.h>

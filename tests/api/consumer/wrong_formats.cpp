@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Does not compile with -Werror=format: each call lacks its argument, and the compiler knows the methods' formats.
 #include "quo_base/quorelReport.h"
 

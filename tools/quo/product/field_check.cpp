@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "field_check.h"
 
 #include <type_traits>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_TOOL_FIELD_CHECK_H
 #define QUO_TOOL_FIELD_CHECK_H
 

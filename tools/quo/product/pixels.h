@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_TOOL_PIXELS_H
 #define QUO_TOOL_PIXELS_H
 
@@ -18,8 +19,8 @@ public:
     /** The product keeps its orbit. Throws Failure without a grid, a raster's size or an orbit with its look side.
      */
     Pixels(const std::string& header, GeneralSAR& product);
-    /** Makes them those of an image of the same samples whose lines follow each other one step apart, from `first_s`
-     * after the grid's epoch on. */
+    /** Makes them those of an image of the same samples whose lines follow each other one step apart, from
+     * `first_s` after the grid's epoch on. */
     void drop_bursts(double first_s);
     /** Whether there is all that pixels need. */
     static bool known(const std::string& header, GeneralSAR& product);

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_TOOL_PRODUCT_H
 #define QUO_TOOL_PRODUCT_H
 
@@ -40,9 +41,9 @@ struct Told {
     explicit Told(const GeneralSAR& product);
 
     std::string mission, swath, orbit_number, scene;
-    std::string mode;          ///< "IW" of the swath "IW1", where swaths are named after their mode, else the header's
-    std::string polarization;  ///< "VV"
-    std::string image_type;    ///< "SLC" or "GRD", or what else the header calls it
+    std::string mode;  ///< "IW" of the swath "IW1", where swaths are named after their mode, else the header's
+    std::string polarization;           ///< "VV"
+    std::string image_type;             ///< "SLC" or "GRD", or what else the header calls it
     std::string direction;              ///< of the orbit: "ascending", "descending"
     std::string start_time, stop_time;  ///< of the region's first and last line, ISO 8601 in UTC
 };

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "generalSAR/derived_raster/corner_points.h"
 
 namespace quo {

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "generalSAR/objects/annex_file.h"
 
 #include <array>

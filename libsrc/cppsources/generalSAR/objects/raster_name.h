@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_RASTER_NAME_H
 #define QUO_RASTER_NAME_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "generalSAR/orbit/orbit_check.h"
 
 #include <algorithm>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_ORBIT_INTERPOLATION_H
 #define QUO_ORBIT_INTERPOLATION_H
 

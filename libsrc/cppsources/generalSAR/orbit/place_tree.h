@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_PLACE_TREE_H
 #define QUO_PLACE_TREE_H
 

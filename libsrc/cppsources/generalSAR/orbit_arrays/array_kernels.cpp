@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "generalSAR/orbit_arrays/array_kernels.h"
 
 #include "sarutillib/ground/processor_level.h"

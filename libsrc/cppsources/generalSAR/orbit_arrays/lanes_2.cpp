@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "generalSAR/orbit_arrays/lane_kernels.h"
 
 namespace quo {

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_GEOMETRY_KERNELS_H
 #define QUO_GEOMETRY_KERNELS_H
 

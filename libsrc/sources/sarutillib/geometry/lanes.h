@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_LANES_H
 #define QUO_LANES_H
 

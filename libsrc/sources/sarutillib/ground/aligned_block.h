@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_ALIGNED_BLOCK_H
 #define QUO_ALIGNED_BLOCK_H
 

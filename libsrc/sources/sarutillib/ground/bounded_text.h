@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_BOUNDED_TEXT_H
 #define QUO_BOUNDED_TEXT_H
 

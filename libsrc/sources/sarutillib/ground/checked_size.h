@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_CHECKED_SIZE_H
 #define QUO_CHECKED_SIZE_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_FILE_IO_H
 #define QUO_FILE_IO_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_GEN_UTILS_DATES_H
 #define QUO_GEN_UTILS_DATES_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* File positions, names and copies. */
 
 #include <algorithm>

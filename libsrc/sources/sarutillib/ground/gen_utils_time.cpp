@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /* The three time notations, and comparison without regard to case. */
 
 #include <algorithm>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_NUMBER_TEXT_H
 #define QUO_NUMBER_TEXT_H
 

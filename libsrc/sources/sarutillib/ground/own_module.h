@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_OWN_MODULE_H
 #define QUO_OWN_MODULE_H
 

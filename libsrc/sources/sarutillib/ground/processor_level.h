@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_PROCESSOR_LEVEL_H
 #define QUO_PROCESSOR_LEVEL_H
 

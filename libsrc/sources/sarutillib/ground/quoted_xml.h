@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_QUOTED_XML_H
 #define QUO_QUOTED_XML_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_UTF8_H
 #define QUO_UTF8_H
 

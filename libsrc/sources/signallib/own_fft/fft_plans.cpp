@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "signallib/own_fft/fft_plans.h"
 
 #include <algorithm>

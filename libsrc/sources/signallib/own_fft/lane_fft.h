@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #ifndef QUO_LANE_FFT_H
 #define QUO_LANE_FFT_H
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "signallib/own_fft/lane_fft.h"
 
 namespace quo {

@@ -1,3 +1,5 @@
+// SPDX-License-Identifier: Apache-2.0
+
 // Transforms by kernels of our own, of lengths without a prime factor above 7: nothing to load and nothing to
 // measure.
 #include <map>
