@@ -44,8 +44,11 @@ QUO_BASE_API int region_image_grid(const GeneralSAR& product, ImageGrid_Obj& gri
  *
  * All sections of that header are taken over, and those that place the raster are made to fit: "ImageGrid" (made
  * of the region where the other header has none, so that every pixel keeps its times), "ROI", sampling rates that
- * are the image's own, and corner points, which the orbit gives of the corner pixels. A header
- * that stood at the raster's place is replaced.
+ * are the image's own with the bands that they bound ("SpectralWindows", "DataSetInfo"; the pulse's stays), bursts
+ * and start in "SwathInfo" where they were the whole image's, and corner points, which the orbit gives of the
+ * corner pixels; where it does not, those of a raster that shows less than the other one are left out. Of bursts
+ * those stay of which the raster has lines; one alone becomes an image without bursts. A header that stood at the
+ * raster's place is replaced.
  * @param raster  its description is the new raster's
  * @param header  header of the other raster; it may be the new one's own place
  * @param how     where its pixels come from

@@ -9,6 +9,7 @@
 #include "quo_base/gen_utils.h"
 #include "quo_base/generalSAR_configuration.h"
 #include "quo_base/interp.h"
+#include "quo_base/mission_import.h"
 #include "quo_base/product.h"
 #include "quo_base/profile.h"
 #include "quo_base/quorelReport.h"
@@ -328,6 +329,17 @@ void lay_out_delivery(const std::string& folder) {
         test::write_text(folder + place + kDelivered + (place[1] == 'a' ? ".xml" : ".tiff"), part);
     }
 }
+Run import_product(Folder folder) {
+    static const std::string annotation = std::string{"annotation/"} + kDelivered + ".xml";
+    setenv("QUO_TIFF_MODULE", QUO_TEST_TIFF_MODULE, 1);
+    return [from = file_in(folder, annotation.c_str()), to = file_in(folder, "new.raw")] {
+        quo_import_request request{};
+        request.source = from;
+        request.raster = to;
+        quo_import_result result{};
+        return quo_import_sentinel1(&request, &result);
+    };
+}
 
 constexpr auto kOldOrNew = test::Promise::kOldOrNew, kReports = test::Promise::kReports,
                kUnchanged = test::Promise::kUnchanged, kTells = test::Promise::kTells,
@@ -373,6 +385,7 @@ const std::vector<test::Job>& test::jobs() {
                                  {"BufferedStream", kTells, write_stream<48>},
                                  {"UpdatedRaster", kTells, update_raster},
                                  {"BufferFileMade", kOldOrNew, make_raster},
+                                 {"importProduct", kOldOrNew, import_product},
                                  {"Chirp", kTells, write_chirp},
                                  {"Dump", kTells, dump},
                                  {"Report", kSurvives, report},

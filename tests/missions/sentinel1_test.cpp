@@ -51,6 +51,29 @@ std::unique_ptr<quo::MissionProduct> described(const Safe& safe, const std::stri
     return made;
 }
 
+/** An orbit file of the annotation's own vectors, so many metres off in x. */
+std::string orbit_beside(const Safe& safe, const test::TemporaryFolder& folder, double off_m) {
+    std::string list;
+    const quo::MissionXml xml{safe.annotation().string()};
+    for (const auto& orbit : xml.root().list("generalAnnotation/orbitList", "orbit")) {
+        list += "<OSV><UTC>UTC=" + orbit.text("time") + "</UTC>";
+        for (const char* const axis : {"x", "y", "z"}) {
+            const std::string name{static_cast<char>(axis[0] - 'x' + 'X')}, lower{axis};
+            const double at_m = orbit.number("position/" + lower) + (lower == "x" ? off_m : 0.0);
+            list.append("<").append(name).append(">").append(std::to_string(at_m));
+            list.append("</").append(name).append("><V").append(name).append(">");
+            list.append(orbit.text("velocity/" + lower)).append("</V").append(name).append(">");
+        }
+        list += "</OSV>";
+    }
+    test::write_text(folder.file("own.EOF"),
+                     "<E><Earth_Explorer_Header><Fixed_Header><Mission>Sentinel-1A</Mission></Fixed_Header>"
+                     "<Variable_Header><Ref_Frame>EARTH_FIXED</Ref_Frame></Variable_Header>"
+                     "</Earth_Explorer_Header><Data_Block><List_of_OSVs>" +
+                         list + "</List_of_OSVs></Data_Block></E>");
+    return folder.file("own.EOF");
+}
+
 // --- Times and tie points ---------------------------------------------------------------------------------------
 
 TEST(Sentinel1, TakesTimesToTheMicrosecond) {
@@ -201,12 +224,8 @@ TEST(Sentinel1, RefusesBurstsThatContradictTheImage) {
 TEST(Sentinel1, KeepsTheDelayUnderAnotherOrbit) {
     const test::Report report;
     const test::TemporaryFolder folder;
-    Safe safe{folder, kSlc};
-    // The minutes of the orbit file's vectors.
-    for (const auto& [from, to] :
-         {std::pair{"17:04", "14:11"}, {"17:05", "14:12"}, {"17:06", "14:13"}, {"17:07", "14:14"}})
-        safe.change(std::string{"2022-01-04T"} + from, std::string{"2023-08-23T"} + to);
-    const auto own = described(safe), other = described(safe, kOrbit);
+    const Safe safe{folder, kSlc};
+    const auto own = described(safe), other = described(safe, orbit_beside(safe, folder, 90.0));
     EXPECT_EQ(own->grid.DelayShare, 0.5);
     EXPECT_EQ(own->grid.DelayReference_s, other->grid.DelayReference_s);
     EXPECT_NE(own->header.orbit.pSV_m[0], other->header.orbit.pSV_m[0]);
@@ -284,7 +303,8 @@ TEST_P(Modes, AreTakenOverByWhatTheAnnotationHas) {
     EXPECT_EQ(product.dataSetInfo.RangeBandwidth[4] > 0.0, grd);
 
     // A second annotation like it, such as the next vignette's, can only be told by its name.
-    fs::copy(safe.annotation(), test::replaced(safe.annotation().string(), "00", "09"));
+    fs::copy(safe.annotation(),
+             safe.annotation().parent_path() / test::replaced(safe.annotation().filename().string(), "00", "09"));
     EXPECT_EQ(import_safe(safe.path(), folder.file("scene"), result), 1);
     EXPECT_NE(std::string{result.message}.find("2 annotations of this swath and polarization; name one of them"),
               std::string::npos)
@@ -422,13 +442,48 @@ INSTANTIATE_TEST_SUITE_P(
                     Layout{"DetectedTiles", 16, SAMPLEFORMAT_UINT, COMPRESSION_LZW, true, true, 0}),
     [](const auto& test) { return std::string{test.param.name}; });
 
+// A strip of the whole image was unpacked at once, and its samples widened beside it.
+TEST(Sentinel1, TakesLongStripsInParts) {
+    const test::Report report;
+    for (const bool packed : {false, true})
+        for (const bool big_endian : {false, true}) {
+            const test::TemporaryFolder folder;
+            Safe safe{folder, kGrd};
+            safe.change("<numberOfLines>16705<", "<numberOfLines>43<");
+            write_tiff(
+                safe.measurement(),
+                {"", 16, SAMPLEFORMAT_UINT,
+                 static_cast<std::uint16_t>(packed ? COMPRESSION_LZW : COMPRESSION_NONE), false, big_endian, 43},
+                43, 26102, true);
+            const std::string source = safe.path(), raster = folder.file("scene");
+            int told = 0;
+            quo_import_request request{};
+            request.source = source.c_str();
+            request.raster = raster.c_str();
+            request.context = &told;
+            request.progress = [](void* context, std::int64_t, std::int64_t) {
+                ++*static_cast<int*>(context);
+                return 0;
+            };
+            quo_import_result result{};
+            ASSERT_EQ(quo_import_sentinel1(&request, &result), 0) << result.message;
+            EXPECT_GE(told, 4);
+            const std::string bytes = test::read_text(raster);
+            std::vector<std::int32_t> values(std::size_t{43} * 26102);
+            ASSERT_EQ(bytes.size(), values.size() * sizeof values[0]);
+            std::memcpy(values.data(), bytes.data(), bytes.size());
+            for (std::uint32_t i = 0; i < values.size(); ++i)
+                ASSERT_EQ(values[i], static_cast<std::uint16_t>(part_of(i / 26102, i % 26102, 0))) << i;
+        }
+}
+
 // --- Cuts and other samplings -----------------------------------------------------------------------------------
 
 struct Cut {
     const char *name, *safe;
     int lines, samples;  // of the whole
     RasterDerivation how;
-    int cut_lines, cut_samples;
+    int cut_lines, cut_samples, bursts;
 };
 class Cuts : public testing::TestWithParam<Cut> {};
 
@@ -468,6 +523,12 @@ TEST_P(Cuts, KeepTheTimesOfTheirPixels) {
     ASSERT_EQ(product.GSread((part + ".hdr").c_str()), 0);
     EXPECT_STREQ(product.dataSetInfo.SceneID, safe.annotation().stem().c_str());
     const ROI_Obj& region = product.roi.Roi;
+    EXPECT_EQ(of_part.Bursts, cut.bursts);
+    EXPECT_EQ(product.swathInfo.Bursts, cut.bursts);
+    EXPECT_EQ(product.swathInfo.Lines_per_burst, cut.bursts > 0 ? 4 : 0);
+    EXPECT_EQ(product.swathInfo.Acquisition_Start_Time, region.SlowStartTime);
+    EXPECT_LE(product.spectralWindows.RgLookBandwidth, product.samplingConstants.frg_hz);
+    EXPECT_LE(product.dataSetInfo.RangeBandwidth[0], product.samplingConstants.frg_hz);
     for (const double line : {0.0, cut.cut_lines - 1.0})
         for (const double sample : {0.0, cut.cut_samples - 1.0}) {
             const double there_line = cut.how.first_line + line * cut.how.line_step,
@@ -486,13 +547,15 @@ TEST_P(Cuts, KeepTheTimesOfTheirPixels) {
                             2e-3);
         }
 }
-INSTANTIATE_TEST_SUITE_P(Sentinel1, Cuts,
-                         testing::Values(Cut{"Bursts", kSlc, 12, 300, {5.0, 100.0, 1.0, 1.0}, 6, 150},
-                                         Cut{"WithinABurst", kSlc, 12, 300, {5.0, 0.0, 1.0, 1.0}, 2, 300},
-                                         Cut{"FinerSamples", kSlc, 12, 300, {0.0, 0.0, 1.0, 0.5}, 12, 600},
-                                         Cut{"GroundRange", kGrd, 4, 26102, {1.0, 13000.0, 1.0, 1.0}, 2, 1000},
-                                         Cut{"CoarserGround", kGrd, 4, 26102, {0.0, 6000.0, 2.0, 4.0}, 2, 5000}),
-                         [](const auto& test) { return std::string{test.param.name}; });
+INSTANTIATE_TEST_SUITE_P(
+    Sentinel1, Cuts,
+    testing::Values(Cut{"Bursts", kSlc, 12, 300, {5.0, 100.0, 1.0, 1.0}, 6, 150, 2},
+                    Cut{"WithinABurst", kSlc, 12, 300, {5.0, 0.0, 1.0, 1.0}, 2, 300, 0},
+                    Cut{"FinerSamples", kSlc, 12, 300, {0.0, 0.0, 1.0, 0.5}, 12, 600, 3},
+                    Cut{"CoarserSamples", kSlc, 12, 300, {0.0, 0.0, 1.0, 2.0}, 12, 150, 3},
+                    Cut{"GroundRange", kGrd, 4, 26102, {1.0, 13000.0, 1.0, 1.0}, 2, 1000, 0},
+                    Cut{"CoarserGround", kGrd, 4, 26102, {0.0, 6000.0, 2.0, 4.0}, 2, 5000, 0}),
+    [](const auto& test) { return std::string{test.param.name}; });
 
 TEST(CommitDerived, RefusesAndLeavesNothing) {
     const test::Report report;
@@ -575,6 +638,14 @@ TEST(Sentinel1, NamesTheFileThatIsDamaged) {
     EXPECT_EQ(import_safe(slc.path(), folder.file("scene"), waiting), 1);
     EXPECT_EQ(waiting.message, slc.measurement() + ": is no regular file");
     EXPECT_EQ(result.message, slc.measurement() + ": is cut short or damaged at line 0");
+    // The system's cause, of the name that was asked for; libtiff's complaint, which names the file itself.
+    fs::remove(slc.measurement());
+    fs::rename(folder.file("kept"), slc.measurement());
+    EXPECT_EQ(import_safe(slc.path(), folder.file("none/scene"), result), 9);
+    EXPECT_EQ(result.message, folder.file("none/scene") + ": cannot be written: No such file or directory");
+    test::write_text(slc.measurement(), "none");
+    EXPECT_EQ(import_safe(slc.path(), folder.file("scene"), result), 1);
+    EXPECT_EQ(std::string{result.message}.rfind(slc.measurement()), 0U) << result.message;
     grd.change("<numberOfSamples>26102<", "<numberOfSamples>1<");
     try {
         (void)described(grd);
@@ -644,7 +715,7 @@ TEST(Sentinel1, NeverReplacesTheProductsOwnFiles) {
 
 TEST(Sentinel1, TakesAnOrbitFileThatFits) {
     const test::Report report;
-    const test::TemporaryFolder folder;
+    const test::TemporaryFolder folder, folder_of_own;
     Safe safe{folder, kSlc};
     safe.shrink(false);
     write_tiff(safe.measurement(), kPlain, 40, 30, true);
@@ -661,6 +732,15 @@ TEST(Sentinel1, TakesAnOrbitFileThatFits) {
     EXPECT_EQ(orbit.nSV_n, 8);  // from 40 s before the image to 40 s after it
     EXPECT_EQ(orbit.t0SV_s, 1219414283.657814);
     EXPECT_EQ(orbit.dtSV_s, 10.0);
+    // The annotation's own orbit, moved.
+    Safe own{folder_of_own, kSlc};
+    own.shrink(false);
+    write_tiff(own.measurement(), kPlain, 40, 30, true);
+    for (const auto& [off_m, status] : {std::pair{110.0, 1}, {90.0, 0}})
+        EXPECT_EQ(
+            import_safe(own.path(), folder.file("scene"), result, orbit_beside(own, folder_of_own, off_m).c_str()),
+            status)
+            << result.message;
     const test::TemporaryFolder other;
     const Safe grd{other, kGrd};
     write_tiff(grd.measurement(), {"", 16, SAMPLEFORMAT_UINT, COMPRESSION_LZW, true, false, 0}, 16705, 26102,

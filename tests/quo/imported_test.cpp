@@ -74,6 +74,23 @@ TEST_P(Imported, IsRightUntilHeaderAndRasterPart) {
     EXPECT_EQ(test::quo({"get", part + ".hdr", "ROI/Lines"}).out, bursts ? "159\n" : "200\n");
     EXPECT_EQ(test::quo({"convert", part, folder_.file("few"), "--lines", "90:110"}).exit_status, 0);
     EXPECT_EQ(test::quo({"validate", folder_.file("few")}).out, "0 errors, 0 warnings\n");
+    // Lines of one burst are an image's; a band is no wider than its sampling; one sample has the step of its
+    // neighbours.
+    const std::string one = folder_.file("one");
+    for (const auto& [verb, from, option, value] :
+         {std::array<std::string, 4>{"convert", raster(), "--samples", "7:8"},
+          {"convert", raster(), "--lines", "1000:1400"},
+          {"resample", one, "--lines", "100"},
+          {"resample", one, "--samples", "10"}}) {
+        EXPECT_EQ(test::quo({verb, from, one, option, value}).exit_status, 0) << verb << option;
+        EXPECT_EQ(test::quo({"validate", one}).out, "0 errors, 0 warnings\n") << verb << option;
+    }
+    // Without an orbit corner points stay as long as they are the raster's.
+    test::write_text(one + ".hdr", test::replaced(test::read_text(one + ".hdr"), "StateVectorData", "Others"));
+    for (const auto& [lines, kept] : {std::pair{":", true}, {"0:50", false}}) {
+        EXPECT_EQ(test::quo({"convert", one, one, "--lines", lines}).exit_status, 0);
+        EXPECT_EQ(test::read_text(one + ".hdr").find("GroundCornersPoints") != std::string::npos, kept);
+    }
     const struct {
         const char *from, *to, *finding;
     } kSpoilt[] = {
@@ -233,6 +250,7 @@ TEST_P(Imported, MakesAnItemThatItsSchemasAllow) {
     const auto made = test::quo({"stac", raster()});
     ASSERT_EQ(made.exit_status, 0) << made.err;
     const json item = json::parse(made.out);
+    EXPECT_EQ(json::parse(test::quo({"stac", raster(), "--id", "mine"}).out)["id"], "mine");
     for (const auto& [path, fits] : kRules) {
         const json::json_pointer place{path};
         ASSERT_TRUE(item.contains(place)) << path;

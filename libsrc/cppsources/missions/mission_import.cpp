@@ -14,6 +14,8 @@
 #include <memory>
 #include <new>
 #include <string>
+#include <string_view>
+#include <system_error>
 #include <vector>
 
 #include "diagnosticslib/call_frame.h"
@@ -32,6 +34,14 @@ constexpr const char* kSource = "mission_import";
 namespace fs = std::filesystem;
 
 [[noreturn]] void refuse(int status, const std::string& line) { throw MissionRefusal{status, line}; }
+
+/** Refuses a file that could not be written, with what the system says of it. */
+void require_written(int status, const BufferFile& file, const std::string& name) {
+    if (status == QUO_OK) return;
+    const int error = file.systemError();
+    refuse(status,
+           name + ": cannot be written" + (error != 0 ? ": " + std::generic_category().message(error) : ""));
+}
 
 // --- The measurement --------------------------------------------------------------------------------------------
 
@@ -56,7 +66,11 @@ std::unique_ptr<Measurement> open_measurement(const std::string& file, const Mis
     std::unique_ptr<Measurement> measurement{
         measurement_entry()(kMeasurementVersion, file.c_str(), why, sizeof why)};
     errno = 0;
-    if (!measurement) refuse(QUO_REFUSED, file + ": " + why);
+    if (!measurement) {
+        const std::string named = file + ": ";  // some of libtiff's complaints begin with the name, too
+        const std::string_view said{why};
+        refuse(QUO_REFUSED, named + (why + (said.starts_with(named) ? named.size() : 0)));
+    }
     if (measurement->lines != product.lines || measurement->samples != product.samples)
         refuse(QUO_REFUSED, file + ": has " + std::to_string(measurement->lines) + " lines of " +
                                 std::to_string(measurement->samples) + " samples, the annotation says " +
@@ -111,8 +125,7 @@ private:
         for (std::size_t done = 0; done < count; done += kPiece) {
             const std::size_t piece = std::min(kPiece, count - done);
             raster_.write(bytes + done, static_cast<int>(piece));
-            if (const int status = raster_.status())
-                refuse(status, std::string{request_.raster} + ": cannot be written");
+            require_written(raster_.status(), raster_, request_.raster);
             written_ += static_cast<std::int64_t>(piece);
             tell();
         }
@@ -233,7 +246,7 @@ private:
         if (error) refuse(QUO_WRITE_FAILED, name_ + ": an older import's, cannot be removed: " + error.message());
     }
     void require(int status) const {
-        if (status != QUO_OK) refuse(status, name_ + ": cannot be written");
+        require_written(status, raster_, name_ + ", the raster of the product's antenna pattern");
     }
 
     std::string name_, header_;
@@ -290,6 +303,10 @@ void import_product(const MissionReader& reader, const quo_import_request& reque
 
     BufferFile& raster = product->header.bufferFile;
     describe_raster(*measurement, request.raster, raster);
+    // Before the pattern's, so that a folder that takes no files is told of the name that was asked for.
+    BufferFile copy;
+    copy.clone(&raster);
+    if (request.link == 0) require_written(copy.create(), copy, raster_name);
     PatternRaster pattern{raster_name + ".antenna", product->header.antennaPattern};
     const auto describe = [&] {
         product->header.GSenable(gsBufferFile);
@@ -298,13 +315,10 @@ void import_product(const MissionReader& reader, const quo_import_request& reque
     if (request.link != 0) {
         link_product(files, *measurement, raster_name, raster, describe);
     } else {
-        BufferFile copy;
-        copy.clone(&raster);
-        if (const int status = copy.create()) refuse(status, raster_name + ": cannot be made");
         BlockWriter{request, files.measurement, *measurement, copy}.copy();
         const HeaderSession session{header.c_str()};
         describe();
-        if (const int status = copy.commit()) refuse(status, raster_name + ": cannot be written");
+        require_written(copy.commit(), copy, raster_name);
     }
     pattern.commit();
     result.lines = product->lines;

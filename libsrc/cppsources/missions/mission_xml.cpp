@@ -17,11 +17,16 @@
 namespace quo {
 namespace {
 
-/** A text that belongs to libxml2. */
-std::string taken(xmlChar* text) {
-    if (!text) return {};
-    const std::unique_ptr<xmlChar, void (*)(void*)> own{text, xmlFree};
-    return std::string{trimmed(reinterpret_cast<const char*>(text))};
+/** The text in nodes and below them. libxml2's own function gives an empty or a cut text when memory runs out. */
+std::string text_in(const xmlNode* node) {
+    std::string text;
+    for (; node; node = node->next) {
+        if ((node->type == XML_TEXT_NODE || node->type == XML_CDATA_SECTION_NODE) && node->content)
+            text += reinterpret_cast<const char*>(node->content);
+        else if (node->type == XML_ELEMENT_NODE)
+            text += text_in(node->children);
+    }
+    return text;
 }
 
 _xmlNode* child(_xmlNode* node, std::string_view name) {
@@ -89,9 +94,10 @@ std::vector<MissionXml::Element> MissionXml::Element::list(std::string_view path
     return elements;
 }
 
-std::string MissionXml::Element::text() const { return taken(xmlNodeGetContent(node_)); }
+std::string MissionXml::Element::text() const { return std::string{trimmed(text_in(node_->children))}; }
 std::string MissionXml::Element::attribute(const char* name) const {
-    return taken(xmlGetProp(node_, reinterpret_cast<const xmlChar*>(name)));
+    const xmlAttr* const found = xmlHasProp(node_, reinterpret_cast<const xmlChar*>(name));
+    return found ? std::string{trimmed(text_in(found->children))} : std::string{};
 }
 
 void MissionXml::Element::refuse(const std::string& why, int status) const {

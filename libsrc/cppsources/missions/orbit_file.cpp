@@ -91,4 +91,22 @@ std::vector<MissionVector> read_orbit_file(const std::string& file, const std::s
     return vectors;
 }
 
+void require_same_orbit(const std::vector<MissionVector>& vectors, GeneralSAROrbit& stated,
+                        const std::string& source) {
+    constexpr double kMost_m = 100.0;
+    const double last_s = stated.t0SV_s + stated.dtSV_s * (stated.nSV_n - 1);
+    double off_m = 0.0;
+    for (const MissionVector& vector : vectors) {
+        const double time_s = vector.time.seconds();
+        double there[3];
+        if (time_s < stated.t0SV_s || time_s > last_s || stated.SVGetPos(time_s, there) != QUO_OK) continue;
+        off_m = std::max(off_m, std::hypot(there[0] - vector.position_m[0], there[1] - vector.position_m[1],
+                                           there[2] - vector.position_m[2]));
+    }
+    if (off_m > kMost_m)
+        throw MissionRefusal{QUO_REFUSED, source + ": its vectors are up to " +
+                                              std::to_string(std::llround(off_m)) +
+                                              " m off the annotation's; the most is 100 m"};
+}
+
 }  // namespace quo

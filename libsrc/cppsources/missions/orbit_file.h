@@ -8,6 +8,7 @@
 #include "missions/mission_xml.h"
 
 class GeneralSAR;
+class GeneralSAROrbit;
 
 namespace quo {
 
@@ -25,6 +26,11 @@ void set_orbit(GeneralSAR& product, const std::vector<MissionVector>& vectors, c
  * Refuses a file that is of another satellite or does not cover that time. */
 std::vector<MissionVector> read_orbit_file(const std::string& file, const std::string& satellite,
                                            const SplitTime& first, const SplitTime& last);
+
+/** Refuses vectors of `source` that are more than 100 m off the orbit that the annotation states: the orbits of a
+ * satellite differ by metres, those of another time or place by more. */
+void require_same_orbit(const std::vector<MissionVector>& vectors, GeneralSAROrbit& stated,
+                        const std::string& source);
 
 }  // namespace quo
 

@@ -493,9 +493,11 @@ void describe_sentinel1(const MissionFiles& files, const std::string& orbit_file
     }
     // The tie points are of the annotation's own orbit: by another one the delay would take up what that one
     // mends.
-    if (!orbit_file.empty())
-        set_orbit(header, read_orbit_file(orbit_file, a.header.text("missionId"), a.first_line, a.last_line),
-                  orbit_file);
+    if (!orbit_file.empty()) {
+        const auto vectors = read_orbit_file(orbit_file, a.header.text("missionId"), a.first_line, a.last_line);
+        require_same_orbit(vectors, header.orbit, orbit_file);
+        set_orbit(header, vectors, orbit_file);
+    }
     if (ties.find_times(header.orbit)) product.ties = ties.compare(product.grid, header.orbit);
     set_region(a, product.grid, header);
     set_polynomials(a, product.grid, header);

@@ -81,7 +81,8 @@ public:
     }
 
     bool read(std::int32_t block, void* to) noexcept override {
-        return tiled_ ? read_tiles(block, static_cast<char*>(to)) : read_strip(block, to);
+        if (tiled_) return read_tiles(block, static_cast<char*>(to));
+        return block_lines == strip_lines_ ? read_strip(block, to) : read_lines(block, static_cast<char*>(to));
     }
 
 private:
@@ -112,8 +113,16 @@ private:
         } else {
             TIFFGetFieldDefaulted(tiff_, TIFFTAG_ROWSPERSTRIP, &rows);
             if (rows == 0) return "its strips have no lines";
+            if (static_cast<std::uint64_t>(TIFFScanlineSize(tiff_)) != row_bytes())
+                return "its lines have no size that is believed";
         }
         block_lines = static_cast<std::int32_t>(std::min<std::uint32_t>(rows, static_cast<std::uint32_t>(lines)));
+        if (!tiled_) {
+            strip_lines_ = block_lines;
+            constexpr std::size_t kMostBytes = 1 << 20;  // a strip may be the whole image
+            const auto fitting = static_cast<std::int32_t>(std::max<std::size_t>(1, kMostBytes / row_bytes()));
+            block_lines = std::min(block_lines, fitting);
+        }
         plain_from = find_plain();
         return nullptr;
     }
@@ -126,11 +135,12 @@ private:
         if (tiled_ || compression != COMPRESSION_NONE || order != FILLORDER_MSB2LSB) return -1;
         const std::uint64_t first = TIFFGetStrileOffset(tiff_, 0);
         std::uint64_t next = first;
-        const std::int32_t blocks = (lines - 1) / block_lines + 1;
-        for (std::int32_t block = 0; block < blocks; ++block) {
-            const std::uint64_t bytes = static_cast<std::uint64_t>(lines_in(block)) * row_bytes();
-            if (TIFFGetStrileOffset(tiff_, static_cast<std::uint32_t>(block)) != next ||
-                TIFFGetStrileByteCount(tiff_, static_cast<std::uint32_t>(block)) != bytes)
+        for (std::int32_t line = 0, strip = 0; line < lines;
+             line += std::min(strip_lines_, lines - line), ++strip) {
+            const std::uint64_t bytes =
+                static_cast<std::uint64_t>(std::min(strip_lines_, lines - line)) * row_bytes();
+            if (TIFFGetStrileOffset(tiff_, static_cast<std::uint32_t>(strip)) != next ||
+                TIFFGetStrileByteCount(tiff_, static_cast<std::uint32_t>(strip)) != bytes)
                 return -1;
             next += bytes;
         }
@@ -149,6 +159,19 @@ private:
         const auto bytes = static_cast<tmsize_t>(static_cast<std::size_t>(lines_in(block)) * row_bytes());
         const auto strip = static_cast<std::uint32_t>(block);
         return fill_absent(strip, to, bytes) || TIFFReadEncodedStrip(tiff_, strip, to, bytes) == bytes;
+    }
+
+    /** Line by line, which libtiff unpacks without the rest of a strip. */
+    bool read_lines(std::int32_t block, char* to) noexcept {
+        const std::int32_t first = block * block_lines;
+        for (std::int32_t line = first; line < first + lines_in(block); ++line, to += row_bytes()) {
+            const auto row = static_cast<std::uint32_t>(line);
+            if (!fill_absent(row / static_cast<std::uint32_t>(strip_lines_), to,
+                             static_cast<tmsize_t>(row_bytes())) &&
+                TIFFReadScanline(tiff_, to, row, 0) != 1)
+                return false;
+        }
+        return true;
     }
 
     bool read_tiles(std::int32_t block, char* to) noexcept {
@@ -173,6 +196,7 @@ private:
     TIFF* tiff_ = nullptr;
     Complaint complaint_;
     bool tiled_ = false;
+    std::int32_t strip_lines_ = 0;
     std::uint32_t tile_width_ = 0;
     std::vector<char> tile_;
 };

@@ -1,10 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <algorithm>
 #include <cmath>
 #include <cstdint>
+#include <iterator>
 #include <nlohmann/json.hpp>
 #include <optional>
 
 #include "commands.h"
+#include "date.h"
 #include "document.h"
 #include "field_check.h"
 #include "output.h"
@@ -109,8 +112,21 @@ std::string defect_of(const FieldOptions& options) {
     return "";
 }
 
-int set_field(const FieldOptions& options) {
+/** A date for a field of a time since 1985 becomes its seconds; any other value stays as it is. */
+std::string in_seconds(const std::string& field, const std::string& value) {
+    constexpr std::string_view kTimes[] = {"ROI/SlowStartTime", "SwathInfo/Acquisition_Start_Time",
+                                           "StateVectorData/t0SV_s", "ImageGrid/Epoch_s"};
+    const bool is_time = std::ranges::find(kTimes, field) != std::end(kTimes) ||
+                         (field.starts_with("PolySAR/") && field.ends_with("/taz0_s"));
+    if (!is_time || finite_number(value)) return value;
+    const auto time_s = time_of(value);
+    return time_s ? exact(*time_s) : value;
+}
+
+int set_field(const FieldOptions& given) {
+    FieldOptions options = given;
     require_field(options.field);
+    for (std::string& value : options.values) value = in_seconds(options.field, value);
     for (const std::string& value : options.values) {
         if (value.size() >= Document::kTextRoom) {
             throw WrongUse("a value of " + std::to_string(value.size()) + " bytes");

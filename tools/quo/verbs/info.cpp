@@ -18,8 +18,8 @@ void add_number(Facts& facts, const char* name, const char* key, double value, d
     constexpr double kUnknown = -900.0;
     if (value > kUnknown) facts.add(name, key, handy(value * scale) + " " + unit, value);
 }
-void add_time(Facts& facts, const char* name, const char* key, double seconds) {
-    const std::string date = date_text(seconds).value_or("-");
+void add_time(Facts& facts, const char* name, const char* key, double seconds, DateForm form) {
+    const std::string date = date_text(seconds, form).value_or("-");
     facts.add(name, key, date + "  (" + exact(seconds) + " s)", {{"seconds", seconds}, {"date", date}});
 }
 
@@ -36,22 +36,22 @@ void add_data_set(Facts& facts, const DataSetInfo_Obj& info) {
     facts.add_text("look side", "look_side", info.LookDirection < 0 ? "left" : "right");
 }
 
-void add_region(Facts& facts, const ROI_Obj& region) {
+void add_region(Facts& facts, const ROI_Obj& region, DateForm form) {
     if (region.isNULL() != 0) return;
-    add_time(facts, "first line", "first_line", region.SlowStartTime);
-    add_time(facts, "last line", "last_line", last_line_time(region));
+    add_time(facts, "first line", "first_line", region.SlowStartTime, form);
+    add_time(facts, "last line", "last_line", last_line_time(region), form);
     add_number(facts, "span", "span_s", region.SlowTimeLength, 1.0, "s");
     facts.add("region", "region",
               std::to_string(region.Lines) + " lines x " + std::to_string(region.Samples) + " samples",
               {{"lines", region.Lines}, {"samples", region.Samples}});
 }
 
-void add_orbit(Facts& facts, const GeneralSAROrbit& orbit) {
+void add_orbit(Facts& facts, const GeneralSAROrbit& orbit, DateForm form) {
     const double last = orbit.t0SV_s + orbit.dtSV_s * (orbit.nSV_n - 1);
     facts.add_text("orbit direction", "orbit_direction", orbit.isAscending() ? "ascending" : "descending");
     facts.add("state vectors", "state_vectors",
               std::to_string(orbit.nSV_n) + ", " + exact(orbit.dtSV_s) + " s apart, from " +
-                  date_text(orbit.t0SV_s).value_or("-") + " to " + date_text(last).value_or("-"),
+                  date_text(orbit.t0SV_s, form).value_or("-") + " to " + date_text(last, form).value_or("-"),
               {{"count", orbit.nSV_n}, {"spacing_s", orbit.dtSV_s}, {"first_s", orbit.t0SV_s}, {"last_s", last}});
 }
 
@@ -145,17 +145,18 @@ void add_objects(Facts& facts, const GeneralSAR& product) {
 
 struct InfoOptions {
     std::string header;
-    bool json = false;
+    bool json = false, iso = false;
 };
 
 int show_info(const InfoOptions& options) {
     GeneralSAR product;
     read_product(options.header, product);
+    const DateForm form = options.iso ? DateForm::kIso : DateForm::kHeader;
     Facts facts;
     facts.add_text("header", "header", options.header);
     if (product.GSexists(gsDataSetInfo)) add_data_set(facts, product.dataSetInfo);
-    if (product.GSexists(gsRoi)) add_region(facts, product.roi.Roi);
-    if (product.GSexists(gsOrbit)) add_orbit(facts, product.orbit);
+    if (product.GSexists(gsRoi)) add_region(facts, product.roi.Roi, form);
+    if (product.GSexists(gsOrbit)) add_orbit(facts, product.orbit, form);
     if (const RasterDescription* raster = described_raster(product)) add_raster(facts, *raster);
     if (product.GSexists(gsSamplingConstants)) add_sampling(facts, product);
     int status = kFine;
@@ -177,6 +178,7 @@ void add_info(Command& program) {
     auto [command, options] = add_verb(program, "info", "What a product is: one screen", show_info);
     command.needs("HEADER", options.header, "Product header");
     command.flag("--json", options.json, "Print JSON");
+    command.flag("--iso", options.iso, "Write dates as ISO 8601");
 }
 
 }  // namespace tool

@@ -188,6 +188,12 @@ void require_sense(const QuicklookOptions& options) {
     require_png_name(options.picture);
 }
 
+/** Which power no sample has; null for a raster that shows something. */
+const char* nothing_seen(const Multilook& multilook) {
+    if (!multilook.has_power()) return "that is a finite number";
+    return std::ranges::any_of(multilook.power(), [](float power) { return power > 0.0F; }) ? nullptr : "above 0";
+}
+
 int quicklook(const QuicklookOptions& options) {
     require_sense(options);
     DataFile raster;
@@ -222,8 +228,8 @@ int quicklook(const QuicklookOptions& options) {
                 " m rms, " + rough(map->most_m) + " m at most\n";
     }
     if (!said.empty()) print(said);
-    if (!multilook.has_power())
-        complain(options.raster + ": no sample has a power that is a finite number, the picture is black");
+    if (const char* const none = nothing_seen(multilook))
+        complain(options.raster + ": no sample has a power " + none + ", the picture is black");
     return kFine;
 }
 

@@ -16,6 +16,10 @@ namespace {
 
 using Json = nlohmann::ordered_json;
 
+struct StacOptions {
+    std::string header, id;
+};
+
 // What the extensions of the catalogue's format add to its properties.
 constexpr const char* kExtensions[] = {"https://stac-extensions.github.io/sar/v1.0.0/schema.json",
                                        "https://stac-extensions.github.io/sat/v1.0.0/schema.json",
@@ -37,8 +41,8 @@ std::string band_of(double frequency_ghz) {
 /** A product as an item of a catalogue. */
 class Item {
 public:
-    Item(const std::string& header, GeneralSAR& product)
-        : header_{header}, product_{product}, told_{product}, pixels_{header, product} {}
+    Item(const StacOptions& options, GeneralSAR& product)
+        : header_{options.header}, id_{options.id}, product_{product}, told_{product}, pixels_{header_, product} {}
 
     Json make() {
         const Outline outline = outline_of(header_, product_);
@@ -52,7 +56,7 @@ public:
         return {{"type", "Feature"},
                 {"stac_version", "1.0.0"},
                 {"stac_extensions", kExtensions},
-                {"id", told_.scene.empty() ? raster_of(file).value_or(file) : told_.scene},
+                {"id", id(file)},
                 {"geometry", outline.geometry},
                 {"bbox", outline.box},
                 {"properties", properties_},
@@ -64,6 +68,11 @@ private:
     std::string required(std::string text, const char* what) const {
         if (text.empty()) throw Failure(header_ + ": no " + what + ", without which there is no item");
         return text;
+    }
+
+    [[nodiscard]] std::string id(const std::string& file) const {
+        if (!id_.empty()) return id_;
+        return told_.scene.empty() ? raster_of(file).value_or(file) : told_.scene;
     }
 
     void add_times() {
@@ -137,25 +146,26 @@ private:
         return assets;
     }
 
-    const std::string& header_;
+    const std::string &header_, &id_;
     GeneralSAR& product_;
     const Told told_;
     Pixels pixels_;
     Json properties_ = Json::object();
 };
 
-int stac(const std::string& header) {
+int stac(const StacOptions& options) {
     GeneralSAR product;
-    read_product(header, product);
-    print_json(Item{header, product}.make());
+    read_product(options.header, product);
+    print_json(Item{options, product}.make());
     return kFine;
 }
 
 }  // namespace
 
 void add_stac(Command& program) {
-    auto [command, header] = add_verb(program, "stac", "Prints a product as an item of a STAC catalogue", stac);
-    command.needs("HEADER", header, "Product header");
+    auto [command, options] = add_verb(program, "stac", "Prints a product as an item of a STAC catalogue", stac);
+    command.needs("HEADER", options.header, "Product header");
+    command.takes("--id", options.id, "Identifier of the item, in place of the scene's name");
 }
 
 }  // namespace tool

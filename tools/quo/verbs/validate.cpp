@@ -212,7 +212,6 @@ private:
         const SARPulse_Obj& pulse = product_.pulse;
         check_same("Pulse", "PulseSamplingRate", pulse.PulseSamplingRate, "SamplingConstants/frg_hz",
                    sampling.frg_hz);
-        check_same("Pulse", "Bandwidth", pulse.Bandwidth, "SamplingConstants/Brg_hz", sampling.Brg_hz);
         if (pulse.PulseKRate > kUnknown && pulse.PulseLength > 0.0) {
             check_same("Pulse", "PulseKRate", std::abs(pulse.PulseKRate) * pulse.PulseLength,
                        "times PulseLength, Bandwidth", pulse.Bandwidth);

@@ -207,13 +207,13 @@ int Obj::getRegion(ROI_Obj* region, std::int32_t lines, std::int32_t samples) co
     const auto times = axes.ends_of(lines);
     if (!times) return QUO_REFUSED;
     const auto [first_s, last_s] = *times;
-    const double near_s = axes.range_time(0.0, first_s), far_s = axes.range_time(samples - 1.0, first_s);
+    const double steps = std::max(1, samples - 1);  // one sample has the step to the next
+    const double near_s = axes.range_time(0.0, first_s), far_s = axes.range_time(steps, first_s);
     const double covered = Bursts == 0 ? lines : std::round((last_s - first_s) / LineStep_s) + 1.0;
     const bool possible = covered >= 1.0 && covered <= std::numeric_limits<std::int32_t>::max();
     if (!possible || !std::isfinite(near_s + far_s)) return QUO_REFUSED;
     region->SetSlowAxe(Epoch_s + first_s, LineStep_s, static_cast<int>(covered));
-    region->SetFastAxe(near_s, GroundLists == 0 ? SampleStep_s : (far_s - near_s) / std::max(1, samples - 1),
-                       samples);
+    region->SetFastAxe(near_s, GroundLists == 0 ? SampleStep_s : (far_s - near_s) / steps, samples);
     return QUO_OK;
 }
 
