@@ -247,9 +247,12 @@ TEST(Lfit, FitsTheSelectedParametersOnly) {
 }
 
 TEST(Lfit, SaysThatNothingIsToBeFitted) {
-    const double one[] = {1.0};
-    const int none[] = {0};
-    double a[] = {5.0}, chisq = 6.0;
+    const std::vector<double> ones{1.0};
+    const std::vector<int> nones{0};
+    std::vector<double> as{5.0};
+    const double* const one = ones.data();
+    const int* const none = nones.data();
+    double *const a = as.data(), chisq = 6.0;
     OneBased covar{1, 1};
     test::CapturedStderr captured;
     for (const auto fit : {lfit_mod, lfitd})
