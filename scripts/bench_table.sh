@@ -12,13 +12,14 @@ names=$*
 [ -n "$names" ] || names=$(basename -s _bench.cmake bench/*_bench.cmake)
 
 # Most programs end with a line of column heads and a line for each ratio: its name, two times in ns, the ratio and
-# its limit. Others tell the ratio behind each benchmark and set no limit.
+# its limit; a ratio above its limit stands in bold. Others tell the ratio behind each benchmark and set no limit.
 rows() {
     awk -v command="\`bench/$1\`" '
         past && NF > 4 {
             name = $1
             for (i = 2; i <= NF - 4; ++i) name = name " " $i
-            printf "| %s | %.2f | %.2f | %s |\n", name, $(NF - 1), $NF, command
+            mark = $(NF - 1) > $NF ? "**" : ""
+            printf "| %s | %s%.2f%s | %.2f | %s |\n", name, mark, $(NF - 1), mark, $NF, command
         }
         $1 == "ratio" && $NF == "target" { past = 1 }
         sub(/^ratio=/, "", $NF) { sub(/\/manual_time/, "", $1); printf "| %s | %.2f | | %s |\n", $1, $NF, command }'
