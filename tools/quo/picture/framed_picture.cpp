@@ -10,8 +10,8 @@ namespace {
 
 using drawing::Box, drawing::Canvas, drawing::Frame, drawing::Point;
 
-constexpr double kTop = Canvas::kHeading + 4.0, kSide = 104.0;  // room above and to the right, pixels
-constexpr double kLeast = 320.0;                                // of the longer side
+constexpr double kRoomAbove = Canvas::kHeading + 4.0, kRoomBeside = 104.0;  // room above and to the right, pixels
+constexpr double kLeast = 320.0;                                            // of the longer side
 
 /** How large a picture is shown. */
 struct Shown {
@@ -50,21 +50,21 @@ bool can_be_framed(double width, double height, double aspect) {
 drawing::Picture framed(const drawing::Picture& picture, const FrameAround& around) {
     const auto [width, height] =
         shown_size(static_cast<double>(picture.width), static_cast<double>(picture.height), around.aspect);
-    const Box box{Frame::kLeft, kTop, width, std::round(height)};
-    const double whole_width = std::max(box.right() + kSide, 420.0);
+    const Box box{Frame::kLeft, kRoomAbove, width, std::round(height)};
+    const double whole_width = std::max(box.right() + kRoomBeside, 420.0);
     Canvas canvas{static_cast<std::size_t>(whole_width),
-                  static_cast<std::size_t>(std::max(box.bottom(), kTop + 200.0) + Frame::kBottom)};
+                  static_cast<std::size_t>(std::max(box.bottom(), kRoomAbove + 200.0) + Frame::kBottom)};
     canvas.heading(around.title, around.about);
     canvas.image(picture, box, around.aspect != 1.0);
     Frame{canvas, box, around.across, around.down}.edge();
 
-    double top = kTop;
-    const double middle = box.right() + 0.5 * kSide;
+    double top = kRoomAbove;
+    const double middle = box.right() + 0.5 * kRoomBeside;
     if (around.north_and_east) {
         compass(canvas, {middle, top + 36.0}, around.north_and_east->first, around.north_and_east->second);
         top += 84.0;
     }
-    const double bottom = std::max(box.bottom(), kTop + 200.0);
+    const double bottom = std::max(box.bottom(), kRoomAbove + 200.0);
     level_bar(canvas, {box.right() + 24.0, top, 18.0, std::min(bottom - top - 26.0, 300.0)},
               {"dB", around.low_db, around.high_db}, drawing::grey_ramp());
     return canvas.picture();

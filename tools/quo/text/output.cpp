@@ -17,7 +17,7 @@
 namespace tool {
 namespace {
 
-constexpr std::size_t kBlock = 1 << 16;
+constexpr std::size_t kMostPending = 1 << 16;
 
 }  // namespace
 
@@ -45,13 +45,13 @@ void Output::write(std::string_view text) {
     throw_if_interrupted();
     if (terminal_) {
         pending_ += shown_lines(text);  // tables pass on what stood in their input
-    } else if (text.size() < kBlock) {
+    } else if (text.size() < kMostPending) {
         pending_ += text;
     } else {
         flush();
         put(text);
     }
-    if (pending_.size() >= kBlock) flush();
+    if (pending_.size() >= kMostPending) flush();
 }
 
 void Output::flush() {

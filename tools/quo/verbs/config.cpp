@@ -17,7 +17,7 @@ namespace {
 using Record = GeneralSAR_ConfigurationRecord;
 using Json = nlohmann::ordered_json;
 
-constexpr int kChannel = 1;
+constexpr int kConfigChannel = 1;
 constexpr double kNoBound = 1e30;  // bounds of this size and above stand for none
 
 struct ConfigOptions {
@@ -64,7 +64,7 @@ Json values_of(const parElement& element) {
 
 // --- doc --------------------------------------------------------------------------------------------------------
 
-std::string type_of(const parElement& element) {
+std::string shown_type(const parElement& element) {
     constexpr const char* kNames[] = {"double", "float", "int", "text", "-"};
     const std::string name = kNames[element.type];
     return element.count == 1 ? name : name + " x " + std::to_string(element.count);
@@ -110,8 +110,8 @@ private:
 std::string described(const std::string& heading, const Parameters& parameters) {
     MarkdownTable table{{"parameter", "type", "unit", "bounds", "default", "meaning"}};
     for (const parElement& element : parameters)
-        table.add({element.name, type_of(element), element.unit, bounds_of(element), text_of(values_of(element)),
-                   element.meaning});
+        table.add({element.name, shown_type(element), element.unit, bounds_of(element),
+                   text_of(values_of(element)), element.meaning});
     return "### " + heading + "\n\n" + table.text();
 }
 
@@ -173,7 +173,7 @@ ConfigurationReview review_of(const std::string& file) {
     require_header_file(file);
     ConfigurationReview review;
     forget_system_error();
-    const int status = reviewConfiguration(file.c_str(), kChannel, review);
+    const int status = reviewConfiguration(file.c_str(), kConfigChannel, review);
     if (status != QUO_OK) refuse_header(file, status, "is no configuration file");
     return review;
 }
@@ -197,7 +197,7 @@ int write_new(const ConfigOptions& options) {
     for (const std::string& name : options.records) records.push_back(record_of(name));
     const ScratchFile scratch{options.file};
     if (options.file != "-") keep_what_is_there(options, scratch);
-    for (const auto& record : records) record->writepar(scratch.name().c_str(), kChannel);
+    for (const auto& record : records) record->writepar(scratch.name().c_str(), kConfigChannel);
     Output output{options.file};
     output.write(scratch.text());
     output.commit();
@@ -237,13 +237,13 @@ int show(const ConfigOptions& options) {
     if (review.records.empty()) throw Failure(options.file + ": holds no record");
     Listing listing;
     GeneralSAR_BaseConfiguration shared, fresh_shared;
-    shared.readConf(options.file.c_str(), kChannel, shared.sharedParameter(0).section);
+    shared.readConf(options.file.c_str(), kConfigChannel, shared.sharedParameter(0).section);
     listing.add("shared", shared_parameters(shared), shared_parameters(fresh_shared));
     int status = kFine;
     for (const std::string& name : review.records) {
         const auto record = record_of(name), fresh = record_of(name);
         try {
-            record->readpar(options.file.c_str(), kChannel);
+            record->readpar(options.file.c_str(), kConfigChannel);
             listing.add(name, parameters_of(*record), parameters_of(*fresh));
         } catch (const quorelException&) {
             complain(options.file + ": " + name + " is incomplete; quo config check tells what is missing");

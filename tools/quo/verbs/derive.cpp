@@ -252,19 +252,17 @@ int derive(const DeriveOptions& options) {
     return kFine;
 }
 
-constexpr const char* kAboutText = "Adds polynomials derived from the orbit to a header";
-constexpr const char* kDetails =
-    "Derives what the header's section PolySAR lacks: azimuth FM rate (fr), incidence and look angle (angles), "
-    "slant\n"
-    "to ground range and back (ground). The Doppler is the header's, else 0. Prints how far the polynomials are "
-    "from\n"
-    "the geometry over the region. Everything else in the header stays.\n";
-
 }  // namespace
 
 void add_derive(Command& program) {
-    auto [command, options] = add_verb(program, "derive", kAboutText, derive);
-    command.details(kDetails);
+    auto [command, options] =
+        add_verb(program, "derive", "Adds polynomials derived from the orbit to a header", derive);
+    command.details(
+        "Derives what the header's section PolySAR lacks: azimuth FM rate (fr), "
+        "incidence and look angle (angles), slant\n"
+        "to ground range and back (ground). The Doppler is the header's, else 0. "
+        "Prints how far the polynomials are from\n"
+        "the geometry over the region. Everything else in the header stays.\n");
     command.needs("HEADER", options.header, "Product header, which is changed");
     command.takes(
         "--region", options.region,

@@ -20,17 +20,17 @@ struct FitOptions {
 constexpr int kHighestDegree = 20;
 constexpr std::size_t kMostPoints = 10'000'000;
 
-struct Points {
+struct Pairs {
     std::vector<double> x, y;
     std::string x_name, y_name;
 };
 
-Points read_points(const FitOptions& options) {
+Pairs read_points(const FitOptions& options) {
     Table table{options.input};
     if (table.columns().size() < 2) throw Failure(table.input().name() + ": needs two columns");
     const std::size_t xy[] = {options.x.empty() ? 0 : table.need(options.x),
                               options.y.empty() ? 1 : table.need(options.y)};
-    Points points{.x = {}, .y = {}, .x_name = table.columns()[xy[0]], .y_name = table.columns()[xy[1]]};
+    Pairs points{.x = {}, .y = {}, .x_name = table.columns()[xy[0]], .y_name = table.columns()[xy[1]]};
     while (table.next()) {
         const std::vector<double> numbers = table.numbers(xy);
         if (points.x.size() == kMostPoints) throw Failure(table.place() + ": more than ten million points");
@@ -51,7 +51,7 @@ struct Fit {
     double at(double x) const { return polval(coefficients.data(), degree(), (x - centre) / scale); }
 };
 
-Fit fit_points(const Points& points, int degree) {
+Fit fit_points(const Pairs& points, int degree) {
     Fit fit;
     const auto [least, most] = std::minmax_element(points.x.begin(), points.x.end());
     fit.centre = 0.5 * *least + 0.5 * *most;
@@ -83,7 +83,7 @@ std::vector<double> in_powers_of_x(const Fit& fit) {
     return powers;
 }
 
-std::string as_text(const Points& points, const Fit& fit) {
+std::string as_text(const Pairs& points, const Fit& fit) {
     std::string text = "# " + points.y_name + " over " + points.x_name + ", " + std::to_string(points.x.size()) +
                        " points, degree " + std::to_string(fit.degree()) + "\n# u = (" + points.x_name + " - " +
                        exact(fit.centre) + ") / " + exact(fit.scale) + "\n# rank " +
@@ -97,7 +97,7 @@ std::string as_text(const Points& points, const Fit& fit) {
     return text;
 }
 
-nlohmann::ordered_json as_json(const Points& points, const Fit& fit) {
+nlohmann::ordered_json as_json(const Pairs& points, const Fit& fit) {
     return {{"x", points.x_name},
             {"y", points.y_name},
             {"points", points.x.size()},
@@ -114,7 +114,7 @@ nlohmann::ordered_json as_json(const Points& points, const Fit& fit) {
 }
 
 int fit_table(const FitOptions& options) {
-    const Points points = read_points(options);
+    const Pairs points = read_points(options);
     if (points.x.size() < static_cast<std::size_t>(options.degree) + 1)
         throw Failure(std::to_string(points.x.size()) + " points do not determine degree " +
                       std::to_string(options.degree));
@@ -126,17 +126,14 @@ int fit_table(const FitOptions& options) {
     return kFindings;
 }
 
-constexpr const char* kAbout = "Fits a polynomial to points by least squares";
-constexpr const char* kDetails =
-    "Reads comma-separated values with a line of column names. The fit runs in u = (x - centre) / scale, which "
-    "goes\n"
-    "from -1 to 1 over the points; the coefficients are given for u and for x itself.\n";
-
 }  // namespace
 
 void add_fit(Command& program) {
-    auto [command, options] = add_verb(program, "fit", kAbout, fit_table);
-    command.details(kDetails);
+    auto [command, options] = add_verb(program, "fit", "Fits a polynomial to points by least squares", fit_table);
+    command.details(
+        "Reads comma-separated values with a line of column names. The fit runs in "
+        "u = (x - centre) / scale, which goes\n"
+        "from -1 to 1 over the points; the coefficients are given for u and for x itself.\n");
     command.needs("--degree", options.degree, "Degree of the polynomial", {.within = {{0, kHighestDegree}}});
     command.takes("--input", options.input, "Table to read, - for standard input", {.shows_default = true});
     command.takes("--x", options.x, "Column of the abscissa, else the first");

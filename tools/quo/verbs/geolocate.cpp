@@ -470,25 +470,27 @@ int geolocate(const GeolocateOptions& options) {
     return geolocate_table(scene, options);
 }
 
-constexpr const char* kAbout = "Brings image samples to the ground, or ground points to image samples";
-constexpr const char* kDetails =
-    "Reads and writes comma-separated values with a line of column names; columns that are not needed are passed\n"
-    "through. A row without a solution gets a status other than 0 and empty values.\n"
-    "  ground: reads azimuth_time_s, range_time_s and, if there, doppler_hz and height_m; adds x_m, y_m, z_m,\n"
-    "          latitude_deg, longitude_deg, incidence_deg, look_deg, fm_rate_hz_s, speed_m_s, status\n"
-    "          or without times line and sample; then it adds azimuth_time_s and range_time_s too\n"
-    "  radar:  reads latitude_deg, longitude_deg, height_m and, if there, doppler_hz; adds azimuth_time_s,\n"
-    "          range_time_s, with --pixels line and sample, status\n"
-    "Lines and samples count from 0 at the centre of the first; a point that two bursts see gets a row for each.\n"
-    "Azimuth times may be dates: \"04-JAN-2022 17:05:58.5\" or \"2022-01-04T17:05:58.5Z\".\n"
-    "Points of --to ground lie on the WGS84 ellipsoid, unless a column height_m or --height gives their heights.\n"
-    "A computed column whose name is taken gets the prefix computed_.\n";
-
 }  // namespace
 
 void add_geolocate(Command& program) {
-    auto [command, options] = add_verb(program, "geolocate", kAbout, geolocate);
-    command.details(kDetails);
+    auto [command, options] = add_verb(
+        program, "geolocate", "Brings image samples to the ground, or ground points to image samples", geolocate);
+    command.details(
+        "Reads and writes comma-separated values with a line of column names; "
+        "columns that are not needed are passed\n"
+        "through. A row without a solution gets a status other than 0 and empty values.\n"
+        "  ground: reads azimuth_time_s, range_time_s and, if there, "
+        "doppler_hz and height_m; adds x_m, y_m, z_m,\n"
+        "          latitude_deg, longitude_deg, incidence_deg, look_deg, fm_rate_hz_s, speed_m_s, status\n"
+        "          or without times line and sample; then it adds azimuth_time_s and range_time_s too\n"
+        "  radar:  reads latitude_deg, longitude_deg, height_m and, if there, doppler_hz; adds azimuth_time_s,\n"
+        "          range_time_s, with --pixels line and sample, status\n"
+        "Lines and samples count from 0 at the centre of the first; a point that "
+        "two bursts see gets a row for each.\n"
+        "Azimuth times may be dates: \"04-JAN-2022 17:05:58.5\" or \"2022-01-04T17:05:58.5Z\".\n"
+        "Points of --to ground lie on the WGS84 ellipsoid, unless a column "
+        "height_m or --height gives their heights.\n"
+        "A computed column whose name is taken gets the prefix computed_.\n");
     command.needs("HEADER", options.header, "Product header with the orbit");
     command.needs("--to", options.direction, "Which way", {.one_of = {"ground", "radar"}});
     command.takes("--input", options.input, "Table to read, - for standard input", {.shows_default = true});

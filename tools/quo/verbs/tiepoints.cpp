@@ -233,18 +233,18 @@ int check_tiepoints(const TiepointsOptions& options) {
     return all_solved ? kFine : kFindings;
 }
 
-constexpr const char* kAbout = "Compares a header's geometry with points known from elsewhere";
-constexpr const char* kDetails =
-    "Tie points are ground points whose azimuth time and range time are known. Azimuth time and slant range are\n"
-    "found from the ground point, ground position and incidence angle from the times and the point's height.\n"
-    "Reads azimuth_time_s, range_time_s, latitude_deg, longitude_deg, height_m and incidence_deg from\n"
-    "SCENE_tie_points.csv beside SCENE.xml. Azimuth times may be dates.\n";
-
 }  // namespace
 
 void add_tiepoints(Command& program) {
-    auto [command, options] = add_verb(program, "tiepoints", kAbout, check_tiepoints);
-    command.details(kDetails);
+    auto [command, options] = add_verb(
+        program, "tiepoints", "Compares a header's geometry with points known from elsewhere", check_tiepoints);
+    command.details(
+        "Tie points are ground points whose azimuth time and range time are "
+        "known. Azimuth time and slant range are\n"
+        "found from the ground point, ground position and incidence angle from "
+        "the times and the point's height.\n"
+        "Reads azimuth_time_s, range_time_s, latitude_deg, longitude_deg, height_m and incidence_deg from\n"
+        "SCENE_tie_points.csv beside SCENE.xml. Azimuth times may be dates.\n");
     command.needs("HEADER", options.headers, "Product headers");
     command.takes("--points", options.points, "Tie points of the one header given");
     command.takes(
