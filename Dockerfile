@@ -1,3 +1,5 @@
+# SPDX-License-Identifier: Apache-2.0
+#
 # An image with the tool, the library, its headers and documents, made from the Debian packages; it has no compiler.
 # Nothing of the tests runs this file: it was not built where the project is checked.
 #   docker build -t quo . && docker run --rm -v "$PWD:/data" -w /data quo info scene.hdr
@@ -9,7 +11,8 @@ COPY . /source
 RUN cmake -S /source -B /build -G Ninja && cmake --build /build && \
     cpack -G DEB --config /build/CPackConfig.cmake -B /packages
 
-FROM debian:12-slim
+# Not the slim image, which leaves out documents and manual pages.
+FROM debian:12
 COPY --from=build /packages/*.deb /packages/
 # /packages/*.deb brings the packages that ours depend on, too.
 RUN apt-get update && apt-get install -y --no-install-recommends /packages/*.deb && \

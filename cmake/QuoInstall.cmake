@@ -20,7 +20,9 @@ install(FILES "${PROJECT_SOURCE_DIR}/LICENSE" "${PROJECT_SOURCE_DIR}/NOTICE" DES
         COMPONENT runtime)
 quo_install_licences(${CMAKE_INSTALL_DOCDIR}/licences COMPONENT runtime)
 install(FILES "${PROJECT_SOURCE_DIR}/README.md" "${PROJECT_SOURCE_DIR}/CHANGELOG.md" DESTINATION ${CMAKE_INSTALL_DOCDIR})
-install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples" DESTINATION ${CMAKE_INSTALL_DOCDIR})
+# What builds the examples within the project stays behind; examples/chain builds by itself.
+install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples" DESTINATION ${CMAKE_INSTALL_DOCDIR}
+        REGEX "/examples/(CMakeLists.txt|quoted.cmake)$" EXCLUDE)
 install(DIRECTORY "${PROJECT_SOURCE_DIR}/docs" DESTINATION ${CMAKE_INSTALL_DOCDIR}
         FILES_MATCHING PATTERN "*.md" PATTERN "*.png" PATTERN "*.svg" PATTERN doxygen EXCLUDE)
 # What the tool's and Python's users read comes with those, too.
@@ -44,5 +46,11 @@ file(RELATIVE_PATH to_prefix "/${CMAKE_INSTALL_LIBDIR}/pkgconfig" "/")
 string(REGEX REPLACE "/$" "" to_prefix "${to_prefix}")
 configure_file("${PROJECT_SOURCE_DIR}/cmake/quo_base.pc.in" "${PROJECT_BINARY_DIR}/quo_base.pc" @ONLY)
 install(FILES "${PROJECT_BINARY_DIR}/quo_base.pc" DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+
+# Packages get their links when they are packed, each with the documents of the others beside it.
+install(CODE "if(NOT CMAKE_INSTALL_COMPONENT)
+    execute_process(COMMAND \"${PROJECT_SOURCE_DIR}/cmake/package_links.sh\" \"\$ENV{DESTDIR}\${CMAKE_INSTALL_PREFIX}\"
+        \"${CMAKE_INSTALL_DOCDIR}\" COMMAND_ERROR_IS_FATAL ANY)
+endif()")
 
 include(QuoPackages)

@@ -14,8 +14,8 @@ foreach(component IN LISTS CPACK_COMPONENTS_ALL)
     file(REMOVE_RECURSE "${stage}/share/doc/quo_base")
     file(COPY_FILE "${CMAKE_CURRENT_LIST_DIR}/debian/copyright" "${folder}/copyright")
     file(COPY "${CMAKE_CURRENT_LIST_DIR}/../CHANGELOG.md" DESTINATION "${folder}")
-    execute_process(COMMAND "${CMAKE_CURRENT_LIST_DIR}/package_links.sh" "${stage}" "${CPACK_DEBIAN_${upper}_PACKAGE_NAME}"
-        COMMAND_ERROR_IS_FATAL ANY)
+    execute_process(COMMAND "${CMAKE_CURRENT_LIST_DIR}/package_links.sh" "${stage}"
+        "share/doc/${CPACK_DEBIAN_${upper}_PACKAGE_NAME}" COMMAND_ERROR_IS_FATAL ANY)
     string(TIMESTAMP date "%a, %d %b %Y 00:00:00 +0000" UTC)
     file(WRITE "${folder}/changelog" "quo-base (${CPACK_PACKAGE_VERSION}) unstable; urgency=medium
 

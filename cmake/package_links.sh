@@ -1,12 +1,12 @@
 #!/bin/sh
 # SPDX-License-Identifier: Apache-2.0
 #
-# Lets the links of a package's documents hold in the installed system: what another package has is there, and what only
-# the sources have is named without a link.
-# Usage: package_links.sh STAGE PACKAGE
+# Lets the links of documents hold where they are installed: what another package has is there, and what only the sources
+# have is named without a link.
+# Usage: package_links.sh STAGE FOLDER, where FOLDER is that of the documents, below STAGE
 set -eu
-documents=$1/share/doc
-own=$documents/$2
+own=$1/$2
+documents=$(dirname "$own")
 find "$own" -name '*.md' | while read -r file; do
     folder=$(dirname "$file")
     grep -oE '[^[]\]\([^)# ]+' "$file" | sed 's/^.](//' | sort -u | while read -r link; do

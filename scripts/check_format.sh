@@ -7,5 +7,7 @@ cd "$(dirname "$0")/.."
 echo "Checking the format"
 git ls-files -co --exclude-standard -- '*.h' '*.hpp' '*.c' '*.cpp' '*.inc' | tr '\n' '\0' |
     xargs -0 -r clang-format --dry-run --Werror
-! git ls-files -co --exclude-standard -- '*.h' '*.hpp' '*.c' '*.cpp' '*.inc' '*.cmake' '*CMakeLists.txt' '*.sh' '*.bash' '*.py' '*.pyi' |
-    grep -vE '^(tests/data|fuzz/corpus)/' | tr '\n' '\0' | xargs -0 grep -L '^\(//\|#\) SPDX-License-Identifier: Apache-2.0$' | grep .
+# METADATA.in becomes a file whose format knows no comments.
+! git ls-files -co --exclude-standard -- '*.h' '*.hpp' '*.c' '*.cpp' '*.inc' '*.cmake' '*CMakeLists.txt' '*.sh' '*.bash' '*.py' '*.pyi' \
+    '*.in' '*.toml' '*.sed' '*.dox' '.clang-*' Dockerfile 'examples/*.xml' | grep -vE '^(tests/data/|fuzz/corpus/|python/METADATA.in$)' |
+    tr '\n' '\0' | xargs -0 grep -L '^\(//\|#\|<!--\) SPDX-License-Identifier: Apache-2.0\( -->\)\?$' | grep .

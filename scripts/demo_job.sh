@@ -21,4 +21,6 @@ printf 'azimuth_time_s,range_time_s\n1133090050.25,0.0058123\n' |
 "$sources"/scripts/demo_chain.sh "$1"
 "$sources"/scripts/demo_python.sh "$1"
 echo
-echo "To run quo from any folder: PATH=$(cd "$1" && pwd)/tools/quo:\$PATH"
+echo "To run quo, the examples and the Python package in any folder, tell the shell:"
+echo "sources=$(cd "$sources" && pwd) build=$(cd "$1" && pwd)"
+grep '^export PATH=' "$sources/docs/README.md"

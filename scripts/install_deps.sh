@@ -10,9 +10,9 @@ set -eu
 
 packages="pkg-config ca-certificates g++ cmake ninja-build libxml2-dev libtrio-dev libcli11-dev nlohmann-json3-dev libpng-dev
 libcairo2-dev libtiff-dev libfftw3-dev pybind11-dev python3-dev python3-numpy python3-matplotlib python3-rasterio python3-pyproj
-python3-xarray"
+python3-xarray python3-dask gdal-bin"
 tests="git libgtest-dev libgmock-dev libbenchmark-dev liblapack-dev libeigen3-dev clang-format clang-tidy clang libclang-rt-dev
-valgrind time abigail-tools dpkg-dev file lintian help2man doxygen gdal-bin python3-pytest python3-pip python3-dask
+valgrind time abigail-tools dpkg-dev file lintian help2man doxygen python3-pytest python3-pip
 python3-distributed python3-pyflakes zsh"
 case "${1:-}" in
 "") packages="$packages $tests" ;;

@@ -15,7 +15,8 @@ def main(header, lines="256"):
     power = (np.abs(data.image) ** 2).mean("sample").compute()
     loudest = int(power.values.argmax())
     print(f"{power.size} lines, mean power {float(power.mean()):.6g}")
-    print(f"the strongest, line {loudest}, at {power.azimuth_time.values[loudest]}: {float(power[loudest]):.6g}")
+    seen = np.ravel(data.azimuth_time.isel(line=loudest).values)[0]  # times may differ along a line
+    print(f"the strongest, line {loudest}, seen from {seen} on: {float(power[loudest]):.6g}")
 
 
 if __name__ == "__main__":

@@ -5,6 +5,7 @@ include("${CMAKE_CURRENT_LIST_DIR}/../support/run.cmake")
 
 file(REMOVE_RECURSE "${WORK}")
 run(${CMAKE_COMMAND} --install "${BUILD}" --prefix "${WORK}/prefix")
+run("${CMAKE_CURRENT_LIST_DIR}/../api/links.sh" "${WORK}/prefix/share/doc")
 # Optimising them would take longer than the rest.
 run(${CMAKE_COMMAND} -S "${SOURCE}" -B "${WORK}/build" -G Ninja "-DCMAKE_PREFIX_PATH=${WORK}/prefix"
     -D CMAKE_BUILD_TYPE=Debug

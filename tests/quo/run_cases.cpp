@@ -143,16 +143,22 @@ void expect_stream(const Step& step, char sign, const std::string& text) {
     ADD_FAILURE() << "found\n" << found;
 }
 
-/** What every command finds defined. */
+/** What every command of a transcript finds defined. */
 std::string names() {
     const auto folder_of = [](const char* program) {
         return std::filesystem::path{program}.parent_path().string();
     };
     return "PATH='" + folder_of(QUO_TOOL) + "':'" + folder_of(QUO_MAKE_HEADER) + "':'" +
-           folder_of(QUO_PIXEL_PLACE) + "':'" + folder_of(QUO_PROCESSOR) + R"(':"$PATH")" +
-           "\nscenes='" QUO_TEST_DATA "/scenes' data='" QUO_TEST_DATA "/quo' docs='" QUO_DOCS
-           "' sources='" QUO_DOCS "/..' build='" QUO_BUILD "'\n" +
-           R"(try() { quo "$@" || echo "[$?]"; })" + "\n";
+           folder_of(QUO_COMPLETE_PRODUCT) + R"(':"$PATH")" + "\nscenes='" QUO_TEST_DATA "/scenes' data='" +
+           QUO_TEST_DATA "/quo' docs='" QUO_DOCS "'\n" + R"(try() { quo "$@" || echo "[$?]"; })" + "\n";
+}
+
+/** What the book has its readers type first, the folders apart. */
+std::string names_of_pages() {
+    for (const std::string& line : lines_of(test::read_text(QUO_DOCS "/README.md")))
+        if (line.starts_with("export PATH="))
+            return "sources='" QUO_DOCS "/..' build='" QUO_BUILD "'\n" + line + "\n";
+    throw std::runtime_error("the book does not say what PATH has to be");
 }
 
 class Transcript : public testing::TestWithParam<std::filesystem::path> {};
@@ -162,7 +168,8 @@ TEST_P(Transcript, Holds) {
     ASSERT_FALSE(cases.empty());
     for (const Case& one : cases) {
         const test::TemporaryFolder folder;
-        const std::string beginning = "cd '" + folder.path().string() + "'\n" + names();
+        const std::string beginning =
+            "cd '" + folder.path().string() + "'\n" + (one.page ? names_of_pages() : names());
         for (const Step& step : one.steps) {
             SCOPED_TRACE(one.title + ", line " + std::to_string(step.line) + "\n$ " + step.command);
             const test::Finished run = test::Child{"/bin/sh", {"-c", beginning + step.command}}.wait();
@@ -206,9 +213,11 @@ INSTANTIATE_TEST_SUITE_P(Pages, Transcript, testing::ValuesIn(pages_to_run()), n
 
 TEST(Book, ListsItsPages) {
     const std::string book = test::read_text(QUO_DOCS "/README.md");
-    for (const auto& page : pages())
-        EXPECT_TRUE(page.stem() == "README" || book.find("](" + page.filename().string() + ")") != book.npos)
-            << page;
+    for (const auto& page : pages()) {
+        const std::string title = lines_of(test::read_text(page.string())).at(0).substr(2);
+        const std::string link = "[" + title + "](" + page.filename().string() + ")";
+        EXPECT_TRUE(page.stem() == "README" || book.find(link) != book.npos) << link;
+    }
 }
 
 }  // namespace
