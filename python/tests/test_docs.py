@@ -69,6 +69,9 @@ def test_the_examples_of_the_page_run(scene_file, tmp_path, monkeypatch, capsys)
     shown: dict = {}
     for block in blocks_of("README.md") + blocks_of("docs/tutorial.md"):
         exec(block, shown)
+    Path("scene.xml").symlink_to(scene_file)
+    for block in blocks_of("docs/polynomials.md") + blocks_of("docs/recipes.md"):
+        exec(block, {})
     assert shown["ground"].status.sum() == 0 and shown["scene_map"].image.shape == (300, 300)
     assert np.array_equal(names["block"], samples[100:150, ::2]) and names["seen"].status.sum() == 0
     assert names["scene_map"]["image"].shape == (300, 300) and [each.state for each in names["outcomes"]] == ["made"]
