@@ -79,8 +79,8 @@ void time_calls(benchmark::State& state, int (*subject)(int)) {
 }
 void Frame(benchmark::State& state) { time_calls(state, framed_call); }
 void PlainInterface(benchmark::State& state) { time_calls(state, plain_interface_call); }
-BENCHMARK(Frame)->UseManualTime();
-BENCHMARK(PlainInterface)->UseManualTime();
+BENCHMARK(Frame)->Name("call with a frame / bare call")->UseManualTime();
+BENCHMARK(PlainInterface)->Name("call with a frame by plain functions / bare call")->UseManualTime();
 
 // ---- Allocation: free one of the live blocks at random, allocate another
 
@@ -115,7 +115,13 @@ void TrackedAllocation(benchmark::State& state) {
         [&] { return churn(live, kSteps, malloc_ckerr, free_ckerr); });
     exit_ckerr();
 }
-BENCHMARK(TrackedAllocation)->Arg(1)->Arg(100)->Arg(1000)->Arg(16000)->UseManualTime();
+BENCHMARK(TrackedAllocation)
+    ->Name("tracked allocation / malloc, live blocks")
+    ->Arg(1)
+    ->Arg(100)
+    ->Arg(1000)
+    ->Arg(16000)
+    ->UseManualTime();
 
 /** One working array per call, as most functions have. */
 void FrameWithBuffer(benchmark::State& state) {
@@ -140,7 +146,7 @@ void FrameWithBuffer(benchmark::State& state) {
         state, kCalls, [&] { return seconds_of(floor); }, [&] { return seconds_of(subject); });
     exit_ckerr();
 }
-BENCHMARK(FrameWithBuffer)->UseManualTime();
+BENCHMARK(FrameWithBuffer)->Name("frame and tracked buffer / calloc and free")->UseManualTime();
 
 /** A failing call cleans up its few blocks beside many of its callers'. */
 void FreeallBesideLiveBlocks(benchmark::State& state) {
@@ -171,7 +177,12 @@ void FreeallBesideLiveBlocks(benchmark::State& state) {
     for (void* block : callers) free_ckerr(block);
     exit_ckerr();
 }
-BENCHMARK(FreeallBesideLiveBlocks)->Arg(0)->Arg(100)->Arg(16000)->UseManualTime();
+BENCHMARK(FreeallBesideLiveBlocks)
+    ->Name("failing call frees 10 blocks / free, callers' blocks")
+    ->Arg(0)
+    ->Arg(100)
+    ->Arg(16000)
+    ->UseManualTime();
 
 /** First touch of a working array of 16 MiB: the steps are its pages of 4 KiB. */
 void FirstTouch(benchmark::State& state) {
@@ -191,7 +202,7 @@ void FirstTouch(benchmark::State& state) {
         state, static_cast<double>(kSize) / 4096, [&] { return touch(std::malloc, std::free); },
         [&] { return touch(malloc_ckerr, free_ckerr); });
 }
-BENCHMARK(FirstTouch)->UseManualTime();
+BENCHMARK(FirstTouch)->Name("first touch of 16 MiB, tracked / malloc")->UseManualTime();
 
 /** Two threads beside one, in a process that has two in either case: the last benchmark, since earlier ones are to
  * find a process with one thread. `ratio` is below 0.59 where two allocate at 1.7 times the rate of one. */
@@ -206,7 +217,7 @@ void TwoThreads(benchmark::State& state) {
         state, 2 * kSteps, [&] { return 2 * seconds_of(one); }, [&] { return seconds_of(two); });
     exit_ckerr();
 }
-BENCHMARK(TwoThreads)->UseManualTime();
+BENCHMARK(TwoThreads)->Name("tracked allocations: two threads / one")->UseManualTime();
 
 }  // namespace
 

@@ -281,8 +281,8 @@ int main(int argc, char** argv) {
     benchmark::RegisterBenchmark("own/known_plan", make_known_plan);
     benchmark::RegisterBenchmark("own/new_plan", make_new_plan);
     benchmark::RegisterBenchmark("two_microseconds", two_microseconds);
-    ratios.push_back({"zero padding 4096 -> 8192", "own/zero_padding", "fftw/zero_padding", 1.0});
-    ratios.push_back({"making and releasing a known plan", "own/known_plan", "two_microseconds", 1.0});
-    ratios.push_back({"making and releasing a new plan", "own/new_plan", "two_microseconds", 100.0});
+    ratios.push_back({"zero padding 4096 -> 8192 by quo / fftw", "own/zero_padding", "fftw/zero_padding", 1.0});
+    ratios.push_back({"making and releasing a known plan / 2 us", "own/known_plan", "two_microseconds", 1.0});
+    ratios.push_back({"making and releasing a new plan / 2 us", "own/new_plan", "two_microseconds", 100.0});
     return bench::run(argc, argv, ratios);
 }

@@ -150,9 +150,10 @@ BENCHMARK(build_and_save)->Apply(counts);
 }  // namespace
 
 int main(int argc, char** argv) {
-    return bench::run(argc, argv,
-                      {{"read, 600 polynomials", "read_product/100", "parse_and_walk/100", 3.0},
-                       {"read, 6000 polynomials", "read_product/1000", "parse_and_walk/1000", 3.0},
-                       {"write, 600 polynomials", "write_product/100", "build_and_save/100", 4.0},
-                       {"write, 6000 polynomials", "write_product/1000", "build_and_save/1000", 4.0}});
+    return bench::run(
+        argc, argv,
+        {{"read, 600 polynomials / parse and walk", "read_product/100", "parse_and_walk/100", 3.0},
+         {"read, 6000 polynomials / parse and walk", "read_product/1000", "parse_and_walk/1000", 3.0},
+         {"write, 600 polynomials / build and save", "write_product/100", "build_and_save/100", 4.0},
+         {"write, 6000 polynomials / build and save", "write_product/1000", "build_and_save/1000", 4.0}});
 }

@@ -177,12 +177,13 @@ BENCHMARK(parse_product);
 }  // namespace
 
 int main(int argc, char** argv) {
-    return bench::run(argc, argv,
-                      {{"read 1000", "read_header/1000", "parse_and_walk/1000", 1.2},
-                       {"read 10000", "read_header/10000", "parse_and_walk/10000", 1.2},
-                       {"read 100000", "read_header/100000", "parse_and_walk/100000", 1.2},
-                       {"write 1000", "write_header/1000", "build_and_save/1000", 2.2},
-                       {"write 10000", "write_header/10000", "build_and_save/10000", 2.2},
-                       {"write 100000", "write_header/100000", "build_and_save/100000", 2.2},
-                       {"read a product of 14 objects", "read_product_in_a_session", "parse_product", 2.5}});
+    return bench::run(
+        argc, argv,
+        {{"read 1000 / parse and walk", "read_header/1000", "parse_and_walk/1000", 1.2},
+         {"read 10000 / parse and walk", "read_header/10000", "parse_and_walk/10000", 1.2},
+         {"read 100000 / parse and walk", "read_header/100000", "parse_and_walk/100000", 1.2},
+         {"write 1000 / build and save", "write_header/1000", "build_and_save/1000", 2.2},
+         {"write 10000 / build and save", "write_header/10000", "build_and_save/10000", 2.2},
+         {"write 100000 / build and save", "write_header/100000", "build_and_save/100000", 2.2},
+         {"read a product of 14 objects / parse it", "read_product_in_a_session", "parse_product", 2.5}});
 }

@@ -22,7 +22,12 @@ rows() {
             printf "| %s | %s%.2f%s | %.2f | %s |\n", name, mark, $(NF - 1), mark, $NF, command
         }
         $1 == "ratio" && $NF == "target" { past = 1 }
-        sub(/^ratio=/, "", $NF) { sub(/\/manual_time/, "", $1); printf "| %s | %.2f | | %s |\n", $1, $NF, command }'
+        sub(/^ratio=/, "", $NF) {
+            ratio = $NF
+            sub(/\/manual_time.*/, "")
+            if (sub(/\/[0-9]+$/, ":&")) sub(/:\//, ": ")  # a count behind the name
+            printf "| %s | %.2f | | %s |\n", $0, ratio, command
+        }'
 }
 
 echo '| measured / beside | ratio | limit | command in the build folder |'

@@ -48,7 +48,7 @@ def draw_a_map_of_islands(cut_map, folder):
     assert (folder / "islands.png").stat().st_size > 1e4
 
 
-def test_the_examples_of_the_page_run(tmp_path, monkeypatch, capsys):
+def test_the_examples_of_the_page_run(scene_file, tmp_path, monkeypatch, capsys):
     rasterio = pytest.importorskip("rasterio")
     distributed = pytest.importorskip("distributed")
     for module in ("pyproj", "matplotlib"):
@@ -59,6 +59,9 @@ def test_the_examples_of_the_page_run(tmp_path, monkeypatch, capsys):
     names: dict = {}
     for block in blocks_of("docs/python.md"):
         exec(block, names)
+    Path("scene.xml").symlink_to(scene_file)
+    for block in blocks_of("docs/polynomials.md") + blocks_of("docs/recipes.md"):
+        exec(block, {})
     assert np.array_equal(names["block"], samples[100:150, ::2]) and names["seen"].status.sum() == 0
     assert names["cut_map"]["image"].shape == (644, 900) and [each.state for each in names["outcomes"]] == ["made"]
     assert names["power"].shape == (LINES,) and names["fit"].rank == 3 and (tmp_path / "maps.png").stat().st_size > 1e4
