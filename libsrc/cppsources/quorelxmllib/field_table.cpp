@@ -30,6 +30,14 @@ bool read_key(const parElement& to, const char* key, const char* section, const 
     return false;
 }
 
+bool read_name(const Field& field, std::int32_t& code, const char* key, const char* section, const char* file) {
+    char text[parElement::kTextRoom] = "";
+    const bool there = !GetMyProfileString(section, key, text, sizeof text, file);
+    const auto found = std::ranges::find(field.names, text, &NamedCode::name);
+    code = found == field.names.end() ? field.unnamed : found->code;
+    return there && code >= 0;
+}
+
 bool is_keyed_array(const Field& field) { return field.array && field.in_profile != InProfile::kAbsent; }
 
 }  // namespace
@@ -177,7 +185,10 @@ bool Record::read_keys(const char* file, const char* section, std::span<const ch
         parElement to;
         field.describe(owner_, to);
         if ((field.array != nullptr) != arrays || field.in_profile == InProfile::kAbsent || to.count < 1) continue;
-        const bool read = read_key(to, keys.empty() ? field.key : keys[i], section, file);
+        const char* const key = keys.empty() ? field.key : keys[i];
+        const bool read = field.names.empty()
+                              ? read_key(to, key, section, file)
+                              : read_name(field, *static_cast<std::int32_t*>(to.pointer), key, section, file);
         if (!read && field.in_profile == InProfile::kMandatory) complete = false;
     }
     return complete;
