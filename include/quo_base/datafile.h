@@ -80,7 +80,7 @@ protected:
     int readSection(const char* side_file);
     /** Reads it from a side file of the profile form, whose CellType and ByteOrder are names. False when a key is
      * missing or the cell type unknown, with the values found taken over. */
-    bool readNames(const char* side_file);
+    __attribute__((visibility("hidden"))) bool readNames(const char* side_file);
     /** Writes it; 0 or a failing status, 1 also for a HeaderOffset that an integer of the file cannot hold. */
     int writeSection(const char* side_file);
     /** Makes a new raster and its side file, with this description, the files of their names, both or neither but

@@ -21,6 +21,12 @@
 
 namespace quo {
 
+/** One function for each type of values, for parElement::withValues(). */
+template <typename... Uses>
+struct ForTypes : Uses... {
+    using Uses::operator()...;
+};
+
 /** How a field takes part in the parameter-file fallback. */
 enum class InProfile : std::uint8_t { kMandatory, kOptional, kAbsent };
 
