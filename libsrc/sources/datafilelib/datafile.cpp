@@ -45,9 +45,13 @@ int finish(quo::CallFrame& frame, int status, int line = __builtin_LINE()) {
     return status == QUO_OK ? frame.success(line) : frame.fail(status, quo::raster_failure(status), line);
 }
 
-// The same for a call that has reported its own failure.
-int pass(quo::CallFrame& frame, int status, int line = __builtin_LINE()) {
-    return status == QUO_OK ? frame.success(line) : frame.callee(status, line);
+/** How the samples of a region stand in memory, in lines of `width`. */
+quo::RegionLayout layout_of(const BufferIO& io, quo::SampleKernel kernel, int width) {
+    const auto size = static_cast<std::int64_t>(quo::sample_size(io.MemoryType));
+    return {kernel, io.Samples, io.Samples * size, width * size, io.File->ByteOrder == 1};
+}
+quo::RegionLayout layout_of(const quo::RasterRegion& prefixes) {
+    return {nullptr, 0, prefixes.piece, prefixes.piece, false};
 }
 
 bool converts(int cell_type) { return cell_type >= FLOAT_COMPLEX && cell_type <= INT16; }
@@ -393,16 +397,16 @@ int BufferIO::readprefix(char* dst) {
     if (const int status = openForReading()) return frame.callee(status);
     quo::RasterRegion region;
     if (File->state_ == 1 || !prefixRegion(region)) return finish(frame, QUO_REFUSED);
-    const quo::RegionLayout layout{nullptr, 0, region.piece, region.piece, false};
-    return pass(frame, File->read(region, layout, dst, quo::line_after(*File, FirstLine, Lines)));
+    return quo::pass_on(frame,
+                        File->read(region, layout_of(region), dst, quo::line_after(*File, FirstLine, Lines)));
 }
 
 int BufferIO::writeprefix(const char* src) {
     quo::CallFrame frame{"BufferIO::writeprefix", kSource};
     quo::RasterRegion region;
     if (!File->is_open() || File->state_ == 0 || !prefixRegion(region)) return finish(frame, QUO_REFUSED);
-    const quo::RegionLayout layout{nullptr, 0, region.piece, region.piece, false};
-    return pass(frame, File->write(region, layout, src, quo::line_after(*File, FirstLine, Lines)));
+    return quo::pass_on(frame,
+                        File->write(region, layout_of(region), src, quo::line_after(*File, FirstLine, Lines)));
 }
 
 int BufferIO::readbuffer(char* dst, int width) {
@@ -413,10 +417,8 @@ int BufferIO::readbuffer(char* dst, int width) {
     if (File->state_ == 1 || !region || width < Samples) return finish(frame, QUO_REFUSED);
     // Without a kernel the destination stays as it is: callers ask for pairs that have no conversion, and go on.
     const auto kernel = quo::find_kernel(quo::SampleAccess::kRegionRead, File->CellType, MemoryType);
-    const auto size = static_cast<std::int64_t>(quo::sample_size(MemoryType));
-    const quo::RegionLayout layout{kernel, Samples, Samples * size, width * size, File->ByteOrder == 1};
-    return pass(frame,
-                File->read(*region, layout, kernel ? dst : nullptr, quo::line_after(*File, FirstLine, Lines)));
+    return quo::pass_on(frame, File->read(*region, layout_of(*this, kernel, width), kernel ? dst : nullptr,
+                                          quo::line_after(*File, FirstLine, Lines)));
 }
 
 int BufferIO::writebuffer(const char* src) { return writebuffer(src, Samples); }
@@ -428,7 +430,6 @@ int BufferIO::writebuffer(const char* src, int width) {
     if (!File->is_open() || File->state_ == 0 || !kernel || !region || width < Samples) {
         return finish(frame, QUO_REFUSED);
     }
-    const auto size = static_cast<std::int64_t>(quo::sample_size(MemoryType));
-    const quo::RegionLayout layout{kernel, Samples, Samples * size, width * size, File->ByteOrder == 1};
-    return pass(frame, File->write(*region, layout, src, quo::line_after(*File, FirstLine, Lines)));
+    return quo::pass_on(frame, File->write(*region, layout_of(*this, kernel, width), src,
+                                           quo::line_after(*File, FirstLine, Lines)));
 }
