@@ -158,9 +158,9 @@ private:
     static bool same(const parElement& a, const parElement& b) {
         if (a.type == parElement::typeString)
             return std::strcmp(static_cast<const char*>(a.pointer), static_cast<const char*>(b.pointer)) == 0;
-        // A float is as long as an int.
-        const std::size_t size = a.type == parElement::typeDouble ? sizeof(double) : sizeof(std::int32_t);
-        return a.count == 0 || std::memcmp(a.pointer, b.pointer, size * static_cast<std::size_t>(a.count)) == 0;
+        return a.withValues([&](auto values) {
+            return values.empty() || std::memcmp(values.data(), b.pointer, values.size_bytes()) == 0;
+        });
     }
 };
 

@@ -78,6 +78,9 @@ protected:
     void refreshParameters() override;
     /** Reads the section from an XML side file; 0 or 1. */
     int readSection(const char* side_file);
+    /** Reads it from a side file of the profile form, whose CellType and ByteOrder are names. False when a key is
+     * missing or the cell type unknown, with the values found taken over. */
+    __attribute__((visibility("hidden"))) bool readNames(const char* side_file);
     /** Writes it; 0 or a failing status, 1 also for a HeaderOffset that an integer of the file cannot hold. */
     int writeSection(const char* side_file);
     /** Makes a new raster and its side file, with this description, the files of their names, both or neither but
@@ -89,6 +92,8 @@ protected:
     int copyPair(const char* from, const char* to, bool overwrite);
 
 private:
+    struct __attribute__((visibility("hidden"))) Table;
+
     int32_t stored_offset_ = 0;  // HeaderOffset as the side file holds it
 };
 

@@ -74,6 +74,8 @@ public:
     /** The object, present or not; the caller casts it to the class that GSObject tells. Null for another number.
      */
     GeneralSAR_Base* GSget(GSObject object) noexcept;
+    /** The object's name in lists for people, such as "SamplingConstants"; empty for another number. */
+    static const char* GSname(GSObject object) noexcept;
     /** What the object registers in its section: its own elements or, for gsRoi, those of the region in it. Null
      * for another number. */
     const GeneralSAR_Base* GSelements(GSObject object) const noexcept;

@@ -247,6 +247,26 @@ public:
     /** Describes the element anew. Before the first registration a count of 1 makes it a scalar. Returns 0. */
     int setElement(const char* element_name, void* values, ParameterType value_type, std::int32_t value_count,
                    double lowest, double highest, bool is_mandatory) noexcept;
+    /** Calls `use` with the values in memory, a span of double, float, std::int32_t or char* (texts), empty while
+     * there are none, and gives what it gives. */
+    template <typename Use>
+    auto withValues(Use use) const {
+        const auto n = static_cast<std::size_t>(count > 0 ? count : 0);
+        char* const text = type == typeString && !text_array ? static_cast<char*>(pointer) : nullptr;
+        switch (type) {
+            case typeDouble:
+                return use(std::span{static_cast<double*>(pointer), n});
+            case typeFloat:
+                return use(std::span{static_cast<float*>(pointer), n});
+            case typeInt:
+                return use(std::span{static_cast<std::int32_t*>(pointer), n});
+            case typeString:
+                return use(text_array ? std::span{static_cast<char* const*>(pointer), n} : std::span{&text, n});
+            case typeNone:
+                break;
+        }
+        return use(std::span<char* const>{});
+    }
     /** What is wrong with one value of the element, given as the text that stands in a header: "17 lies above 1";
      * empty where it makes sense. Numbers must be whole texts, finite, and within the rule's bounds, else the
      * element's own; texts must fit their room and meet the rule. Marks of unknown values (-999) are judged like

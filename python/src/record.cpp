@@ -7,6 +7,9 @@
 #include <cstdint>
 #include <cstring>
 #include <limits>
+#include <span>
+#include <type_traits>
+#include <vector>
 
 #include "arrays.h"
 #include "errors.h"
@@ -55,19 +58,18 @@ std::int32_t integer_of(const py::handle& value) {
 }
 
 template <typename T>
-py::object numbers(const parElement& element) {
-    const auto* const values = static_cast<const T*>(element.pointer);
-    if (element.scalar && element.count == 1) return py::cast(*values);
-    py::array_t<T> array{std::max<py::ssize_t>(element.count, 0), values};
+py::object numbers(const parElement& element, std::span<T> held) {
+    if (element.scalar && held.size() == 1) return py::cast(held[0]);
+    py::array_t<T> array{static_cast<py::ssize_t>(held.size()), held.data()};
     // A copy: what is changed in it would be lost without a word.
     array.attr("setflags")(py::arg("write") = false);
     return array;
 }
 
-py::object texts(const parElement& element) {
-    if (!element.text_array) return text_of(static_cast<const char*>(element.pointer));
+py::object texts(const parElement& element, std::span<char* const> held) {
+    if (!element.text_array) return text_of(held[0]);
     py::list list;
-    for (std::int32_t i = 0; i < element.count; ++i) list.append(text_of(static_cast<char**>(element.pointer)[i]));
+    for (const char* text : held) list.append(text_of(text));
     return list;
 }
 
@@ -86,14 +88,14 @@ py::list items_of(const parElement& element, const py::handle& value) {
 
 /** Sets the numbers of an element; all of them are looked at before the first is set. */
 template <typename T, typename Convert>
-void set_numbers(const parElement& element, const py::handle& value, Convert convert) {
+void set_numbers(const parElement& element, std::span<T> held, const py::handle& value, Convert convert) {
     std::vector<T> made;
-    if (element.scalar && element.count == 1) {
+    if (element.scalar && held.size() == 1) {
         made.push_back(static_cast<T>(convert(value)));
     } else {
         for (const py::handle& item : items_of(element, value)) made.push_back(static_cast<T>(convert(item)));
     }
-    std::copy(made.begin(), made.end(), static_cast<T*>(element.pointer));
+    std::ranges::copy(made, held.begin());
 }
 
 void set_text(char* to, std::size_t room, const py::handle& value) {
@@ -101,26 +103,21 @@ void set_text(char* to, std::size_t room, const py::handle& value) {
     std::memcpy(to, bytes.c_str(), bytes.size() + 1);
 }
 
-void set_texts(const parElement& element, const py::handle& value) {
-    if (!element.text_array) return set_text(static_cast<char*>(element.pointer), element.room, value);
+void set_texts(const parElement& element, std::span<char* const> held, const py::handle& value) {
+    if (!element.text_array) return set_text(held[0], element.room, value);
     std::size_t i = 0;
-    for (const py::handle& item : items_of(element, value))
-        set_text(static_cast<char**>(element.pointer)[i++], element.room, item);
+    for (const py::handle& item : items_of(element, value)) set_text(held[i++], element.room, item);
 }
 
 void set_value(const parElement& element, const py::handle& value) {
-    switch (element.type) {
-        case parElement::typeDouble:
-            return set_numbers<double>(element, value, number_of);
-        case parElement::typeFloat:
-            return set_numbers<float>(element, value, number_of);
-        case parElement::typeInt:
-            return set_numbers<std::int32_t>(element, value, integer_of);
-        case parElement::typeString:
-            return set_texts(element, value);
-        case parElement::typeNone:
-            break;
-    }
+    element.withValues([&]<typename T>(std::span<T> held) {
+        if constexpr (std::is_floating_point_v<T>)
+            set_numbers(element, held, value, number_of);
+        else if constexpr (std::is_integral_v<T>)
+            set_numbers(element, held, value, integer_of);
+        else
+            set_texts(element, held, value);
+    });
 }
 
 bool is_single(const parElement& element) { return element.scalar && !element.text_array; }
@@ -130,19 +127,12 @@ bool is_single(const parElement& element) { return element.scalar && !element.te
 // --- Record -----------------------------------------------------------------------------------------------------
 
 py::object value_of(const parElement& element) {
-    switch (element.type) {
-        case parElement::typeDouble:
-            return numbers<double>(element);
-        case parElement::typeFloat:
-            return numbers<float>(element);
-        case parElement::typeInt:
-            return numbers<std::int32_t>(element);
-        case parElement::typeString:
-            return texts(element);
-        case parElement::typeNone:
-            break;
-    }
-    return py::none();
+    return element.withValues([&]<typename T>(std::span<T> held) -> py::object {
+        if constexpr (std::is_arithmetic_v<T>)
+            return numbers(element, held);
+        else
+            return texts(element, held);
+    });
 }
 
 GeneralSAR_Base& Record::object() const {

@@ -55,8 +55,8 @@ std::vector<std::string> evaluated(const std::string& expression) {
     return texts;
 }
 
-// The documentation states look-ups as XPath expressions: walking must find the same nodes in the same order.
-TEST_F(QuorelxmlLayout, FindsWhatTheDocumentedExpressionFinds) {
+// Messages tell look-ups as XPath expressions: walking must find the same nodes in the same order.
+TEST_F(QuorelxmlLayout, FindsWhatTheExpressionFinds) {
     OpenDocument& document = load(kShapes);
     int found = 0;
     for (const int channel : {1, 2, 3, -5})

@@ -10,6 +10,7 @@
 #include "examples.h"
 #include "failure.h"
 #include "interrupt.h"
+#include "sarutillib/ground/letters.h"
 
 namespace {
 
@@ -40,9 +41,9 @@ constexpr std::string_view kHeaders[] = {"HEADER", "MASTER", "SLAVE", "header"},
 /** Says what is wrong with the command line, and where the user finds help on it. */
 std::string wrong_use(const command_line::Program& program, const std::string& what,
                       std::span<const char* const> words) {
-    std::string help = "quo", verbs;
+    std::string help = "quo";
     for (const std::string& verb : program.given()) help += " " + verb;
-    for (const std::string& verb : program.verbs()) verbs += (verbs.empty() ? "" : ", ") + verb;
+    const std::string verbs = quo::joined(program.verbs());
     const std::size_t next = program.given().size() + 1;
     const std::string_view word = next < words.size() ? words[next] : "";
     if (verbs.empty() || word.starts_with('-')) return what + " (see " + help + " --help)";

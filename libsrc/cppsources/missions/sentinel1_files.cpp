@@ -41,12 +41,6 @@ std::vector<fs::path> annotations_in(const fs::path& folder) {
     return found;
 }
 
-std::string listed(const std::set<std::string>& names) {
-    std::string text;
-    for (const std::string& name : names) text += (text.empty() ? "" : ", ") + name;
-    return text;
-}
-
 fs::path choose(const std::vector<fs::path>& all, const std::string& source, const std::string& swath,
                 const std::string& polarization) {
     std::vector<fs::path> fitting;
@@ -63,9 +57,9 @@ fs::path choose(const std::vector<fs::path>& all, const std::string& source, con
     if (all.empty()) throw MissionRefusal{QUO_REFUSED, source + ": holds no annotation of Sentinel-1"};
     if (fitting.empty())
         throw MissionRefusal{QUO_REFUSED,
-                             source + ": no such swath and polarization; there are " + listed(offered)};
+                             source + ": no such swath and polarization; there are " + joined(offered)};
     if (left.size() > 1)
-        throw MissionRefusal{QUO_REFUSED, source + ": choose a swath and a polarization of " + listed(left) +
+        throw MissionRefusal{QUO_REFUSED, source + ": choose a swath and a polarization of " + joined(left) +
                                               ", or name the annotation"};
     if (fitting.size() > 1)  // vignettes
         throw MissionRefusal{QUO_REFUSED, source + ": holds " + std::to_string(fitting.size()) +

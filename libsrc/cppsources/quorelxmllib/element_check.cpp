@@ -8,6 +8,7 @@
 
 #include "quo_base/gen_utils.h"
 #include "quo_base/quorelxml_v2.h"
+#include "sarutillib/ground/letters.h"
 #include "sarutillib/ground/number_text.h"
 
 namespace {
@@ -59,12 +60,6 @@ bool is_date(std::string_view text) {
     return date2str(std::string{text}.c_str(), &fields) == 0;
 }
 
-std::string list_of(const parRule& rule) {
-    std::string list;
-    for (const std::string_view text : rule.texts) list.append(list.empty() ? "" : ", ").append(text);
-    return list;
-}
-
 std::string text_defect(const parElement& element, std::string_view text) {
     if (text.size() >= element.room)
         return "has " + std::to_string(text.size()) + " bytes, more than " + std::to_string(element.room - 1);
@@ -76,7 +71,7 @@ std::string text_defect(const parElement& element, std::string_view text) {
             break;
         case parRule::listedText:
             if (std::ranges::find(element.rule.texts, text) == element.rule.texts.end())
-                return quoted(text) + " is none of " + list_of(element.rule);
+                return quoted(text) + " is none of " + quo::joined(element.rule.texts);
             break;
         case parRule::dateText:
             if (!is_date(text)) return quoted(text) + " is no date such as 04-JAN-2022 17:05:58.5";

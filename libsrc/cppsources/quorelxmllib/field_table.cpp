@@ -14,20 +14,24 @@ namespace quo {
 namespace {
 
 bool read_key(const parElement& to, const char* key, const char* section, const char* file) {
-    switch (to.type) {
-        case parElement::typeDouble:
-            return !GetProfileDoubleArray(section, key, static_cast<double*>(to.pointer), to.count, file);
-        case parElement::typeFloat:
-            return !GetMyProfileFloatArray(section, key, static_cast<float*>(to.pointer), to.count, file);
-        case parElement::typeInt:
-            return !GetMyProfileIntArray(section, key, static_cast<std::int32_t*>(to.pointer), to.count, file);
-        case parElement::typeString:
-            return !GetMyProfileString(section, key, static_cast<char*>(to.pointer), static_cast<int>(to.room),
-                                       file);
-        case parElement::typeNone:
-            break;
-    }
-    return false;
+    return QUO_OK ==
+           to.withValues(ForTypes{
+               [&](std::span<double> v) { return GetProfileDoubleArray(section, key, v.data(), to.count, file); },
+               [&](std::span<float> v) { return GetMyProfileFloatArray(section, key, v.data(), to.count, file); },
+               [&](std::span<std::int32_t> v) {
+                   return GetMyProfileIntArray(section, key, v.data(), to.count, file);
+               },
+               [&](std::span<char* const> v) {
+                   return GetMyProfileString(section, key, v[0], static_cast<int>(to.room), file);
+               }});
+}
+
+bool read_name(const Field& field, std::int32_t& code, const char* key, const char* section, const char* file) {
+    char text[parElement::kTextRoom] = "";
+    const bool there = !GetMyProfileString(section, key, text, sizeof text, file);
+    const auto found = std::ranges::find(field.names, text, &NamedCode::name);
+    code = found == field.names.end() ? field.unnamed : found->code;
+    return there && code >= 0;
 }
 
 bool is_keyed_array(const Field& field) { return field.array && field.in_profile != InProfile::kAbsent; }
@@ -35,11 +39,10 @@ bool is_keyed_array(const Field& field) { return field.array && field.in_profile
 }  // namespace
 
 void copy_values(const parElement& from, const parElement& to) {
-    const std::size_t size = from.type == parElement::typeString   ? from.room
-                             : from.type == parElement::typeDouble ? sizeof(double)
-                                                                   : sizeof(std::int32_t);
-    if (from.count > 0 && from.pointer != to.pointer)
-        std::memcpy(to.pointer, from.pointer, static_cast<std::size_t>(from.count) * size);
+    const std::size_t bytes =
+        from.withValues(ForTypes{[](auto values) { return values.size_bytes(); },
+                                 [&](std::span<char* const> texts) { return texts.size() * from.room; }});
+    if (bytes > 0 && from.pointer != to.pointer) std::memcpy(to.pointer, from.pointer, bytes);
 }
 
 std::optional<std::int32_t> Field::wanted_count(void* owner) const {
@@ -177,7 +180,10 @@ bool Record::read_keys(const char* file, const char* section, std::span<const ch
         parElement to;
         field.describe(owner_, to);
         if ((field.array != nullptr) != arrays || field.in_profile == InProfile::kAbsent || to.count < 1) continue;
-        const bool read = read_key(to, keys.empty() ? field.key : keys[i], section, file);
+        const char* const key = keys.empty() ? field.key : keys[i];
+        const bool read = field.names.empty()
+                              ? read_key(to, key, section, file)
+                              : read_name(field, *static_cast<std::int32_t*>(to.pointer), key, section, file);
         if (!read && field.in_profile == InProfile::kMandatory) complete = false;
     }
     return complete;

@@ -21,6 +21,12 @@
 
 namespace quo {
 
+/** One function for each type of values, for parElement::withValues(). */
+template <typename... Uses>
+struct ForTypes : Uses... {
+    using Uses::operator()...;
+};
+
 /** How a field takes part in the parameter-file fallback. */
 enum class InProfile : std::uint8_t { kMandatory, kOptional, kAbsent };
 
@@ -35,6 +41,12 @@ struct ArrayKind {
     bool (*assign)(void* member, const void* from);
 };
 
+/** What a parameter file calls one value of a whole number. */
+struct NamedCode {
+    std::string_view name;
+    std::int32_t code;
+};
+
 /** One row: all that is known of a field. The owner is an object of the class that the row was made for. */
 struct Field {
     const char *name = "", *key = "";  // of the element, and in parameter files
@@ -46,6 +58,8 @@ struct Field {
     InProfile in_profile = InProfile::kMandatory;
     parRule rule;
     const char *unit = "", *meaning = "";
+    std::span<const NamedCode> names;  // of a single int that parameter files tell by name; empty for numbers
+    std::int32_t unnamed = 0;          // what another text, or none, stands for; below 0 it is a missing key
 
     void* (*member)(void* owner) = nullptr;
     const ArrayKind* array = nullptr;          // of an array of any length
@@ -87,6 +101,8 @@ public:
      * @return 0; 1, with the pending errors cleared, when a mandatory key failed, and with nothing read when the
      * other form of the file was not found missing but could not be read. */
     int read_profile(const char* file, const char* section, std::span<const char* const> keys = {}) const;
+    /** The same whatever became of the other form; whether no mandatory key failed. */
+    bool read_whole_profile(const char* file, const char* section, std::span<const char* const> keys = {}) const;
 
     /** 4 or 7 when the object's last read of a header file failed because the file could not be read or for want
      * of memory, else 0: then its section is not missing, and no other form of the file may take its place. */
@@ -97,7 +113,6 @@ private:
     [[nodiscard]] const parElement* allocated(std::size_t row) const;
     void copy_values(const Record& from, std::size_t row) const;
     bool read_keys(const char* file, const char* section, std::span<const char* const> keys, bool arrays) const;
-    bool read_whole_profile(const char* file, const char* section, std::span<const char* const> keys) const;
 
     const char* section_;
     std::span<const Field> fields_;
@@ -141,6 +156,14 @@ constexpr auto one_of(std::span<const std::string_view> texts) {
 inline constexpr auto kFilled = checked_by({.text = parRule::filledText});
 inline constexpr auto kDate = checked_by({.text = parRule::dateText});
 
+/** Parameter files tell the value, a single int, by one of the names, in an array that stays. Another text stands
+ * for `otherwise`; below 0, it counts as missing. */
+constexpr auto named(std::span<const NamedCode> names, std::int32_t otherwise) {
+    return [=](Field& field) {
+        field.names = names;
+        field.unnamed = otherwise;
+    };
+}
 /** The unit of the values. */
 constexpr auto unit(const char* unit) {
     return [=](Field& field) { field.unit = unit; };

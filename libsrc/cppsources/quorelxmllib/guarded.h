@@ -20,6 +20,11 @@ int guarded(CallerFrame frame, Operation operation) {
     }
 }
 
+/** Ends a call with the status of its last step, which has reported its own failure. */
+inline int pass_on(CallerFrame frame, int status) {
+    return status == QUO_OK ? frame.success() : frame.callee(status);
+}
+
 }  // namespace quo
 
 #endif

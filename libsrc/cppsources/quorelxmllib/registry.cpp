@@ -7,6 +7,7 @@
 
 #include "diagnosticslib/call_frame.h"
 #include "quo_base/quorelxml_v2.h"
+#include "quorelxmllib/field_table.h"
 #include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_document.h"
 #include "quorelxmllib/header_session.h"
@@ -14,6 +15,7 @@
 #include "sarutillib/ground/bounded_text.h"
 
 using quo::CallFrame;
+using quo::ForTypes;
 using quo::guarded;
 using quo::HeaderSession;
 
@@ -22,16 +24,6 @@ namespace {
 constexpr const char* kSource = "quorelxml_v2";
 constexpr const char* kNoMemory = "Memory allocation failure";
 constexpr std::size_t kNameRoom = 512;
-
-std::span<char* const> texts_of(const parElement& element, char* const& single) {
-    if (!element.text_array) return {&single, 1};
-    return {static_cast<char* const*>(element.pointer), static_cast<std::size_t>(element.count)};
-}
-
-template <typename T>
-T* numbers_of(const parElement& element) {
-    return static_cast<T*>(element.pointer);
-}
 
 /** Whether an element's status fails the whole read: one that found no memory is not known to be missing. */
 bool fails_read(const parElement& element, int status) {
@@ -229,32 +221,25 @@ bool GeneralSAR_BaseXML::getConfigurationFile(const char* file, int channel, con
 // --- writing ----------------------------------------------------------------------------------------------------
 
 bool GeneralSAR_BaseXML::textsCanBeStored() const {
-    return std::ranges::all_of(elements(), [](const parElement& element) {
-        if (element.type != parElement::typeString || element.count < 1) return true;
-        char* const single = static_cast<char*>(element.pointer);
-        return std::ranges::all_of(texts_of(element, single), [](const char* text) {
-            return quo::xml_text(quo::text_or_empty(text)).has_value();
-        });
+    const auto can_be_stored = [](const char* text) {
+        return quo::xml_text(quo::text_or_empty(text)).has_value();
+    };
+    return std::ranges::all_of(elements(), [&](const parElement& element) {
+        return element.withValues(
+            ForTypes{[](auto) { return true; },
+                     [&](std::span<char* const> texts) { return std::ranges::all_of(texts, can_be_stored); }});
     });
 }
 
 int GeneralSAR_BaseXML::writeElement(const parElement& element) {
     const std::string path = section_ + '/' + element.name;
     const char* const field = path.c_str();
-    char* const single = static_cast<char*>(element.pointer);
-    switch (element.type) {
-        case parElement::typeDouble:
-            return document_.writeDouble(channel_, field, numbers_of<double>(element), element.count);
-        case parElement::typeFloat:
-            return document_.writeFloat(channel_, field, numbers_of<float>(element), element.count);
-        case parElement::typeInt:
-            return document_.writeInt(channel_, field, numbers_of<std::int32_t>(element), element.count);
-        case parElement::typeString:
-            return document_.writeString(channel_, field, texts_of(element, single).data(), element.count);
-        case parElement::typeNone:
-            break;
-    }
-    return QUO_REFUSED;
+    const int n = element.count;
+    return element.withValues(
+        ForTypes{[&](std::span<double> v) { return document_.writeDouble(channel_, field, v.data(), n); },
+                 [&](std::span<float> v) { return document_.writeFloat(channel_, field, v.data(), n); },
+                 [&](std::span<std::int32_t> v) { return document_.writeInt(channel_, field, v.data(), n); },
+                 [&](std::span<char* const> v) { return document_.writeString(channel_, field, v.data(), n); }});
 }
 
 int GeneralSAR_BaseXML::writeSection() {
@@ -297,26 +282,20 @@ int GeneralSAR_BaseXML::writeAuxiliaryFile(const char* file, int channel, const 
 int GeneralSAR_BaseXML::readElement(const parElement& element, int count) {
     const std::string path = section_ + '/' + element.name;
     const char* const field = path.c_str();
-    char* const single = static_cast<char*>(element.pointer);
-    switch (element.type) {
-        case parElement::typeDouble:
-            return document_.readDouble(channel_, field, numbers_of<double>(element), count);
-        case parElement::typeFloat:
-            return document_.readFloat(channel_, field, numbers_of<float>(element), count);
-        case parElement::typeInt:
-            return document_.readInt(channel_, field, numbers_of<std::int32_t>(element), count);
-        case parElement::typeString:
-            return document_.readString(channel_, field, texts_of(element, single).data(), count, element.room);
-        case parElement::typeNone:
-            break;
-    }
-    return QUO_REFUSED;
+    return element.withValues(
+        ForTypes{[&](std::span<double> v) { return document_.readDouble(channel_, field, v.data(), count); },
+                 [&](std::span<float> v) { return document_.readFloat(channel_, field, v.data(), count); },
+                 [&](std::span<std::int32_t> v) { return document_.readInt(channel_, field, v.data(), count); },
+                 [&](std::span<char* const> v) {
+                     return document_.readString(channel_, field, v.data(), count, element.room);
+                 }});
 }
 
 int GeneralSAR_BaseXML::readScalars(bool& lengths_changed) {
     for (const parElement& element : elements()) {
         if (!element.scalar || element.type == parElement::typeString) continue;
-        const auto* length = element.type == parElement::typeInt ? numbers_of<std::int32_t>(element) : nullptr;
+        const auto* length =
+            element.type == parElement::typeInt ? static_cast<const std::int32_t*>(element.pointer) : nullptr;
         const std::int32_t before = length ? *length : 0;
         const int status = readElement(element, 1);
         lengths_changed = lengths_changed || (length && *length != before);

@@ -6,6 +6,7 @@
 
 #include "diagnosticslib/call_frame.h"
 #include "quorelxmllib/field_table.h"
+#include "quorelxmllib/guarded.h"
 #include "roilib/rounding.h"
 #include "sarutillib/ground/bounded_text.h"
 
@@ -139,8 +140,7 @@ int FileROI_Obj::SetFile(const char* file, const char* name) {
 int FileROI_Obj::read_roi() {
     quo::CallFrame frame{"FileROI_Obj::read_roi", kSource};
     if (FileName[0] == '\0') return frame.fail(QUO_REFUSED, "The region has no file");
-    if (const int status = read_roi(FileName, SectionName)) return frame.callee(status);
-    return frame.success();
+    return quo::pass_on(frame, read_roi(FileName, SectionName));
 }
 
 QUO_HEADER_RECORD(ROI_Coords, coords::kTable)

@@ -5,19 +5,17 @@
 #include <array>
 #include <cerrno>
 #include <cstring>
-#include <limits>
 #include <new>
 #include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
 
 #include "datafilelib/raster_region.h"
 #include "datafilelib/raster_stream.h"
 #include "datafilelib/sample_kernels.h"
 #include "diagnosticslib/call_frame.h"
 #include "diagnosticslib/saved_in_place.h"
-#include "profilelib/profile_look.h"
-#include "quo_base/profile.h"
 #include "quorelxmllib/field_table.h"
 #include "quorelxmllib/guarded.h"
 #include "quorelxmllib/header_session.h"
@@ -28,109 +26,61 @@
 namespace {
 
 constexpr const char* kSource = "datafile";
-constexpr const char* kSection = "RasterInfo";
-constexpr int kDescriptionElements = 6;
 
-struct CellName {
-    std::string_view name;
-    int code;
-};
 // In the order in which a side file's name is compared. Code 4 has no name.
-constexpr std::array<CellName, 9> kCellNames{{{"FLOAT32", FLOAT32},
-                                              {"INT32", INT32},
-                                              {"INT16", INT16},
-                                              {"FLOAT_COMPLEX", FLOAT_COMPLEX},
-                                              {"SHORT_COMPLEX", SHORT_COMPLEX},
-                                              {"DOUBLE_COMPLEX", DOUBLE_COMPLEX},
-                                              {"FLOAT64", FLOAT64},
-                                              {"INT8", INT8},
-                                              {"INT8_COMPLEX", INT8_COMPLEX}}};
-
-int code_of(std::string_view name) {
-    const auto* found = std::ranges::find(kCellNames, name, &CellName::name);
-    return found == kCellNames.end() ? -1 : found->code;
-}
-
-/** Reads the profile form of a side file, key by key; every key is read. */
-class ProfileForm {
-public:
-    explicit ProfileForm(const char* file) : file_{file} {}
-
-    void read(const char* key, std::int32_t& value) {
-        complete_ = GetParInt(file_, key, 1, &value, 0, kSection) == QUO_OK && complete_;
-    }
-    std::string_view read(const char* key) {
-        text_[0] = '\0';
-        complete_ = GetParString(file_, key, 1, text_, 0, kSection) == QUO_OK && complete_;
-        return text_;
-    }
-    [[nodiscard]] bool complete() const { return complete_; }
-
-private:
-    const char* file_;
-    char text_[512] = "";
-    bool complete_ = true;
-};
-
-/** Takes the description from the profile form of a side file. False when a key is missing or the cell type
- * unknown. */
-bool read_profile(RasterDescription& raster, const char* side_file) {
-    const quo::ProfileLook look{side_file};
-    ProfileForm form{side_file};
-    auto offset = static_cast<std::int32_t>(raster.HeaderOffset);
-    form.read("HeaderOffset", offset);
-    raster.HeaderOffset = offset;
-    form.read("RowPrefix", raster.RowPrefix);
-    form.read("NrOfPixelsPerLine", raster.NrOfPixelsPerLine);
-    form.read("NrOfLinesPerImage", raster.NrOfLinesPerImage);
-    raster.CellType = code_of(form.read("CellType"));
-    // Any other text, in any other letter case, means little-endian.
-    raster.ByteOrder = form.read("ByteOrder") == "MSBFirst" ? 1 : 0;
-    return form.complete() && raster.CellType >= 0;
-}
+constexpr std::array<quo::NamedCode, 9> kCellNames{{{"FLOAT32", FLOAT32},
+                                                    {"INT32", INT32},
+                                                    {"INT16", INT16},
+                                                    {"FLOAT_COMPLEX", FLOAT_COMPLEX},
+                                                    {"SHORT_COMPLEX", SHORT_COMPLEX},
+                                                    {"DOUBLE_COMPLEX", DOUBLE_COMPLEX},
+                                                    {"FLOAT64", FLOAT64},
+                                                    {"INT8", INT8},
+                                                    {"INT8_COMPLEX", INT8_COMPLEX}}};
+// Any other text, in any other letter case, means little-endian.
+constexpr std::array<quo::NamedCode, 1> kByteOrders{{{"MSBFirst", 1}}};
 
 // The status of a transfer as an entry of the report, which names the caller's line.
 int finish(quo::CallFrame& frame, int status, int line = __builtin_LINE()) {
     return status == QUO_OK ? frame.success(line) : frame.fail(status, quo::raster_failure(status), line);
 }
 
-// The same for a call that has reported its own failure.
-int pass(quo::CallFrame& frame, int status, int line = __builtin_LINE()) {
-    return status == QUO_OK ? frame.success(line) : frame.callee(status, line);
+/** How the samples of a region stand in memory, in lines of `width`. */
+quo::RegionLayout layout_of(const BufferIO& io, quo::SampleKernel kernel, int width) {
+    const auto size = static_cast<std::int64_t>(quo::sample_size(io.MemoryType));
+    return {kernel, io.Samples, io.Samples * size, width * size, io.File->ByteOrder == 1};
+}
+quo::RegionLayout layout_of(const quo::RasterRegion& prefixes) {
+    return {nullptr, 0, prefixes.piece, prefixes.piece, false};
 }
 
 bool converts(int cell_type) { return cell_type >= FLOAT_COMPLEX && cell_type <= INT16; }
 
 }  // namespace
 
-RasterDescription::RasterDescription() { createElementsVector(kDescriptionElements); }
-RasterDescription::~RasterDescription() = default;
-
-void RasterDescription::refreshParameters() {
+/** The fields of the description, in a class of its own that sees the private member. */
+struct RasterDescription::Table {
     using Obj = RasterDescription;
     static constexpr quo::FieldTable kTable{
-        kSection,
+        "RasterInfo",
         QUO_FIELD(NrOfLinesPerImage),
         QUO_FIELD(NrOfPixelsPerLine),
-        QUO_FIELD(stored_offset_, quo::element("HeaderOffset")),
+        QUO_FIELD(stored_offset_, "HeaderOffset", quo::element("HeaderOffset")),
         QUO_FIELD(RowPrefix),
-        QUO_FIELD(ByteOrder),
-        QUO_FIELD(CellType),
+        QUO_FIELD(ByteOrder, quo::named(kByteOrders, 0)),
+        QUO_FIELD(CellType, quo::named(kCellNames, -1)),
     };
-    static_assert(kTable.size() == kDescriptionElements);
-    kTable.register_all(*this);
-}
+};
+
+QUO_RECORD(RasterDescription, Table::kTable)
+RasterDescription::~RasterDescription() = default;
 
 int RasterDescription::element_sizeof() const { return static_cast<int>(quo::sample_size(CellType)); }
 int RasterDescription::is_complex() const { return quo::is_complex_type(CellType) ? 1 : 0; }
 
 void RasterDescription::copyDescription(const RasterDescription& from) {
-    NrOfLinesPerImage = from.NrOfLinesPerImage;
-    NrOfPixelsPerLine = from.NrOfPixelsPerLine;
+    Table::kTable.copy(from, *this);
     HeaderOffset = from.HeaderOffset;
-    RowPrefix = from.RowPrefix;
-    ByteOrder = from.ByteOrder;
-    CellType = from.CellType;
 }
 
 int64_t RasterDescription::rasterSize() const {
@@ -140,18 +90,22 @@ int64_t RasterDescription::rasterSize() const {
 
 int RasterDescription::readSection(const char* side_file) {
     stored_offset_ = 0;
-    const bool found = readAuxiliaryFile(side_file, 1, kSection);
+    const bool found = readAuxiliaryFile(side_file, 1, Table::kTable.section());
     if (found) HeaderOffset = stored_offset_;
     return found ? QUO_OK : QUO_REFUSED;
 }
 
-int RasterDescription::writeSection(const char* side_file) {
-    if (HeaderOffset < std::numeric_limits<std::int32_t>::min() ||
-        HeaderOffset > std::numeric_limits<std::int32_t>::max()) {
-        return QUO_REFUSED;
-    }
+bool RasterDescription::readNames(const char* side_file) {
     stored_offset_ = static_cast<std::int32_t>(HeaderOffset);
-    return writeAuxiliaryFile(side_file, 1, kSection);
+    const bool complete = Table::kTable.of(*this).read_whole_profile(side_file, Table::kTable.section());
+    HeaderOffset = stored_offset_;
+    return complete;
+}
+
+int RasterDescription::writeSection(const char* side_file) {
+    if (!std::in_range<std::int32_t>(HeaderOffset)) return QUO_REFUSED;
+    stored_offset_ = static_cast<std::int32_t>(HeaderOffset);
+    return writeAuxiliaryFile(side_file, 1, Table::kTable.section());
 }
 
 int RasterDescription::commitPair(quo::AtomicFile& raster, const char* side_file) {
@@ -364,8 +318,7 @@ int DataFile::read_hdr(const char* file_name) {
         const std::string side_file = sideFile();
         if (readSection(side_file.c_str()) == QUO_OK) return frame.success();
         if (quo::Record::unread(*this) == QUO_NO_MEMORY) return frame.callee(QUO_NO_MEMORY);
-        if (!read_profile(*this, side_file.c_str()))
-            return frame.fail(QUO_REFUSED, "The raster's side file is incomplete");
+        if (!readNames(side_file.c_str())) return frame.fail(QUO_REFUSED, "The raster's side file is incomplete");
         return frame.success();
     });
 }
@@ -444,16 +397,16 @@ int BufferIO::readprefix(char* dst) {
     if (const int status = openForReading()) return frame.callee(status);
     quo::RasterRegion region;
     if (File->state_ == 1 || !prefixRegion(region)) return finish(frame, QUO_REFUSED);
-    const quo::RegionLayout layout{nullptr, 0, region.piece, region.piece, false};
-    return pass(frame, File->read(region, layout, dst, quo::line_after(*File, FirstLine, Lines)));
+    return quo::pass_on(frame,
+                        File->read(region, layout_of(region), dst, quo::line_after(*File, FirstLine, Lines)));
 }
 
 int BufferIO::writeprefix(const char* src) {
     quo::CallFrame frame{"BufferIO::writeprefix", kSource};
     quo::RasterRegion region;
     if (!File->is_open() || File->state_ == 0 || !prefixRegion(region)) return finish(frame, QUO_REFUSED);
-    const quo::RegionLayout layout{nullptr, 0, region.piece, region.piece, false};
-    return pass(frame, File->write(region, layout, src, quo::line_after(*File, FirstLine, Lines)));
+    return quo::pass_on(frame,
+                        File->write(region, layout_of(region), src, quo::line_after(*File, FirstLine, Lines)));
 }
 
 int BufferIO::readbuffer(char* dst, int width) {
@@ -464,10 +417,8 @@ int BufferIO::readbuffer(char* dst, int width) {
     if (File->state_ == 1 || !region || width < Samples) return finish(frame, QUO_REFUSED);
     // Without a kernel the destination stays as it is: callers ask for pairs that have no conversion, and go on.
     const auto kernel = quo::find_kernel(quo::SampleAccess::kRegionRead, File->CellType, MemoryType);
-    const auto size = static_cast<std::int64_t>(quo::sample_size(MemoryType));
-    const quo::RegionLayout layout{kernel, Samples, Samples * size, width * size, File->ByteOrder == 1};
-    return pass(frame,
-                File->read(*region, layout, kernel ? dst : nullptr, quo::line_after(*File, FirstLine, Lines)));
+    return quo::pass_on(frame, File->read(*region, layout_of(*this, kernel, width), kernel ? dst : nullptr,
+                                          quo::line_after(*File, FirstLine, Lines)));
 }
 
 int BufferIO::writebuffer(const char* src) { return writebuffer(src, Samples); }
@@ -479,7 +430,6 @@ int BufferIO::writebuffer(const char* src, int width) {
     if (!File->is_open() || File->state_ == 0 || !kernel || !region || width < Samples) {
         return finish(frame, QUO_REFUSED);
     }
-    const auto size = static_cast<std::int64_t>(quo::sample_size(MemoryType));
-    const quo::RegionLayout layout{kernel, Samples, Samples * size, width * size, File->ByteOrder == 1};
-    return pass(frame, File->write(*region, layout, src, quo::line_after(*File, FirstLine, Lines)));
+    return quo::pass_on(frame, File->write(*region, layout_of(*this, kernel, width), src,
+                                           quo::line_after(*File, FirstLine, Lines)));
 }

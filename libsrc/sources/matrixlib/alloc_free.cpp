@@ -10,7 +10,6 @@
 
 namespace {
 
-// Reports of this file carry this fixed source name.
 // Reports name this source so; programs that read them look for it.
 constexpr const char* kSource = R"(..\..\..\libsrc\sources\matrixlib\alloc_free)";
 

@@ -148,6 +148,25 @@ ProfileLook::~ProfileLook() {
 using quo::ProfileContent;
 using quo::ProfileStore;
 
+namespace {
+
+/** Erases from a file that is in memory, where the caller names something; `from(content)` does it. */
+template <typename Erase>
+void erase(const char* caller, const char* file, bool named, Erase from) noexcept {
+    const auto access = quo::profile_access();
+    quo::or_end_process(quo::kNoMemory, [&] {
+        ProfileContent* const content = file ? ProfileStore::instance().loaded(file) : nullptr;
+        if (!content)
+            std::fprintf(stderr, "Warning: %s called before init\n", caller);
+        else if (named) {
+            ProfileStore::instance().keep(file);
+            from(*content);
+        }
+    });
+}
+
+}  // namespace
+
 extern "C" const char* GetSetProfileChar(int write, const char* section, const char* key, const char* value,
                                          const char* file) noexcept {
     const auto access = quo::profile_access();
@@ -177,27 +196,10 @@ extern "C" void FreeProfile(const char* file) noexcept {
 }
 
 extern "C" void DelProfileKey(const char* section, const char* key, const char* file) noexcept {
-    const auto access = quo::profile_access();
-    quo::or_end_process(quo::kNoMemory, [&] {
-        ProfileContent* const content = file ? ProfileStore::instance().loaded(file) : nullptr;
-        if (!content)
-            std::fputs("Warning: DelProfileKey called before init\n", stderr);
-        else if (section && key) {
-            ProfileStore::instance().keep(file);
-            content->erase_key(section, key);
-        }
-    });
+    erase("DelProfileKey", file, section && key,
+          [&](ProfileContent& content) { content.erase_key(section, key); });
 }
 
 extern "C" void DelProfileSection(const char* section, const char* file) noexcept {
-    const auto access = quo::profile_access();
-    quo::or_end_process(quo::kNoMemory, [&] {
-        ProfileContent* const content = file ? ProfileStore::instance().loaded(file) : nullptr;
-        if (!content)
-            std::fputs("Warning: DelProfileSection called before init\n", stderr);
-        else if (section) {
-            ProfileStore::instance().keep(file);
-            content->erase_section(section);
-        }
-    });
+    erase("DelProfileSection", file, section, [&](ProfileContent& content) { content.erase_section(section); });
 }

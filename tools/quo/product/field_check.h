@@ -2,10 +2,11 @@
 #ifndef QUO_TOOL_FIELD_CHECK_H
 #define QUO_TOOL_FIELD_CHECK_H
 
-#include <cstdint>
+#include <cstddef>
 #include <span>
 #include <string>
 #include <string_view>
+#include <type_traits>
 
 #include "number.h"
 #include "quo_base/quorelxml_v2.h"
@@ -22,20 +23,13 @@ std::string values_defect(const parElement& element, const parElement& fresh, st
 /** Calls `use` with a value in memory: a double, as a header would hold it, an int or a text. */
 template <typename Use>
 auto with_value(const parElement& element, int index, Use use) {
-    switch (element.type) {
-        case parElement::typeDouble:
-            return use(static_cast<const double*>(element.pointer)[index]);
-        case parElement::typeFloat:
-            return use(as_written(static_cast<const float*>(element.pointer)[index]));
-        case parElement::typeInt:
-            return use(static_cast<const std::int32_t*>(element.pointer)[index]);
-        case parElement::typeString:
-            return use(element.text_array ? static_cast<const char* const*>(element.pointer)[index]
-                                          : static_cast<const char*>(element.pointer));
-        case parElement::typeNone:
-            break;
-    }
-    return use("");
+    return element.withValues([&]<typename T>(std::span<T> values) {
+        const auto value = values[static_cast<std::size_t>(index)];
+        if constexpr (std::is_same_v<T, float>)
+            return use(as_written(value));
+        else
+            return use(value);
+    });
 }
 
 /** A value in memory as text: what a header would hold. */

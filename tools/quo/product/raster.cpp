@@ -3,7 +3,6 @@
 
 #include <algorithm>
 #include <array>
-#include <cctype>
 #include <cmath>
 #include <complex>
 #include <filesystem>
@@ -15,6 +14,7 @@
 #include "failure.h"
 #include "interrupt.h"
 #include "number.h"
+#include "sarutillib/ground/letters.h"
 
 namespace tool {
 namespace {
@@ -146,17 +146,9 @@ std::string type_name(int cell_type) {
 std::vector<std::string> type_names() { return {kNames.begin(), kNames.end()}; }
 
 int type_of(std::string_view name) {
-    const auto same = [name](std::string_view known) {
-        return std::ranges::equal(
-            name, known, {}, [](unsigned char c) { return std::toupper(c); },
-            [](unsigned char c) { return static_cast<int>(c); });
-    };
-    const auto* found = std::ranges::find_if(kNames, same);
-    if (found == kNames.end()) {
-        std::string known;
-        for (const std::string_view one : kNames) known.append(known.empty() ? "" : ", ").append(one);
-        throw WrongUse("no cell type " + std::string{name} + "; there are " + known);
-    }
+    const auto* found = std::ranges::find(kNames, quo::upper(std::string{name}));
+    if (found == kNames.end())
+        throw WrongUse("no cell type " + std::string{name} + "; there are " + quo::joined(kNames));
     return static_cast<int>(found - kNames.begin());
 }
 

@@ -11,16 +11,20 @@
 #include "pixels.h"
 #include "product.h"
 #include "quo_base/generalSAR.h"
+#include "sarutillib/ground/letters.h"
 
 namespace tool {
 namespace {
 
-std::vector<std::string> check(const GeneralSAROrbit& orbit) {
+bool is_any(const SVFinding& /*finding*/) { return true; }
+
+/** The findings of one sort. */
+std::vector<std::string> check(const GeneralSAROrbit& orbit, bool (*sort)(const SVFinding&) = is_any) {
     std::vector<SVFinding> findings;
     std::vector<std::string> texts;
     if (orbit.SVCheck(findings) != 0) return {"the state vectors cannot be checked"};
-    texts.reserve(findings.size());
-    for (const SVFinding& finding : findings) texts.emplace_back(finding.text);
+    for (const SVFinding& finding : findings)
+        if (sort(finding)) texts.emplace_back(finding.text);
     return texts;
 }
 
@@ -68,13 +72,7 @@ void require_solved(int status) {
 }
 
 std::string uneven_vectors(const GeneralSAROrbit& orbit) {
-    std::vector<SVFinding> findings;
-    std::string causes;
-    if (orbit.SVCheck(findings) != 0) return "the state vectors cannot be checked";
-    for (const SVFinding& finding : findings) {
-        if (quo::is_uneven(finding)) causes += (causes.empty() ? "" : "; ") + std::string{finding.text};
-    }
-    return causes;
+    return quo::joined(check(orbit, quo::is_uneven), "; ");
 }
 
 void Scene::require_even_vectors() const {

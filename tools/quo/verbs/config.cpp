@@ -10,6 +10,7 @@
 #include "field_check.h"
 #include "output.h"
 #include "quo_base/generalSAR_configuration.h"
+#include "sarutillib/ground/letters.h"
 
 namespace tool {
 namespace {
@@ -44,11 +45,8 @@ Parameters shared_parameters(GeneralSAR_BaseConfiguration& configuration) {
 }
 
 std::unique_ptr<Record> record_of(const std::string& name) {
-    auto record = Record::make(name);
-    if (record) return record;
-    std::string known;
-    for (const char* other : Record::names()) known += (known.empty() ? "" : ", ") + std::string{other};
-    throw WrongUse(name + ": no record; there are " + known);
+    if (auto record = Record::make(name)) return record;
+    throw WrongUse(name + ": no record; there are " + quo::joined(Record::names()));
 }
 
 Json value_at(const parElement& element, int i) {
@@ -198,9 +196,7 @@ int write_new(const ConfigOptions& options) {
     const ScratchFile scratch{options.file};
     if (options.file != "-") keep_what_is_there(options, scratch);
     for (const auto& record : records) record->writepar(scratch.name().c_str(), kConfigChannel);
-    Output output{options.file};
-    output.write(scratch.text());
-    output.commit();
+    write_output(options.file, scratch.text());
     return kFine;
 }
 
@@ -222,7 +218,7 @@ private:
         const Json value = values_of(parameter), usual = values_of(fresh);
         const std::string name = parameter.name;
         json_[section][name] = value;
-        text_ += name + std::string(kColumn - std::min(kColumn - 1, name.size()), ' ') + text_of(value);
+        text_ += column(name, kColumn) + text_of(value);
         if (*parameter.unit != '\0') text_ += std::string{" "} + parameter.unit;
         if (value != usual) text_ += "  (default " + text_of(usual) + ")";
         text_ += '\n';
@@ -261,13 +257,7 @@ int check(const ConfigOptions& options) {
     std::string text;
     for (const auto& [section, name, reason] : review.findings) {
         list.push_back({{"section", section}, {"name", name}, {"reason", reason}});
-        std::string line = section;
-        line += name.empty() ? "" : "/";
-        line += name;
-        line += "  ";
-        line += reason;
-        text += shown(line);
-        text += '\n';
+        text += shown(section + (name.empty() ? "" : "/") + name + "  " + reason) + "\n";
     }
     text += std::to_string(review.findings.size()) + (review.findings.size() == 1 ? " error in " : " errors in ") +
             std::to_string(review.records.size()) + (review.records.size() == 1 ? " record\n" : " records\n");

@@ -62,8 +62,8 @@ struct Direction {
     std::span<const char* const> outputs;
     /** `own` is as freshly loaded, whatever block was before. */
     void (*solve)(const Scene& scene, GeneralSAROrbit& own, Points& points);
-    bool ground = false;       // leads to the ground
-    std::size_t line_at = 99;  // where the line stands among the outputs, if it does
+    bool ground = false;      // leads to the ground
+    std::size_t line_at = 0;  // where the line stands among the outputs; 0 where no pixels are told
 };
 
 constexpr Input kDoppler{"doppler_hz"}, kHeight{"height_m"};
@@ -157,11 +157,6 @@ void find_pixels(const Scene& scene, Points& points) {
         if (points.status[i] == QUO_OK && outside[i] != QUO_OK) points.status[i] = QUO_NOT_SEEN;
 }
 
-void to_pixels(const Scene& scene, GeneralSAROrbit& own, Points& points) {
-    to_radar(scene, own, points);
-    find_pixels(scene, points);
-}
-
 void to_radar_precisely(const Scene& /*scene*/, GeneralSAROrbit& own, Points& points) {
     find_positions(points);
     const auto& [x, y, z] = points.position_m;
@@ -170,11 +165,6 @@ void to_radar_precisely(const Scene& /*scene*/, GeneralSAROrbit& own, Points& po
         points.status[i] = own.earth2satPrecise(point, &points.out[0][i], &points.out[1][i], points.doppler_hz[i]);
     }
     refuse_hidden(own, points);
-}
-
-void to_pixels_precisely(const Scene& scene, GeneralSAROrbit& own, Points& points) {
-    to_radar_precisely(scene, own, points);
-    find_pixels(scene, points);
 }
 
 constexpr Input kSample[] = {{kAzimuthTime}, {"range_time_s"}};
@@ -189,8 +179,8 @@ constexpr Direction kToGround{kSample, std::span{kGeometry}.first(9), to_ground,
 constexpr Direction kPixelsToGround{kPixel, kGeometry, pixels_to_ground, true};
 constexpr Direction kToRadar{kPoint, std::span{kTimes}.first(2), to_radar};
 constexpr Direction kToRadarPrecisely{kPoint, std::span{kTimes}.first(2), to_radar_precisely};
-constexpr Direction kToPixels{kPoint, kTimes, to_pixels, false, 2};
-constexpr Direction kToPixelsPrecisely{kPoint, kTimes, to_pixels_precisely, false, 2};
+constexpr Direction kToPixels{kPoint, kTimes, to_radar, false, 2};
+constexpr Direction kToPixelsPrecisely{kPoint, kTimes, to_radar_precisely, false, 2};
 
 void check_use(const GeolocateOptions& options) {
     const bool ground = options.direction == "ground";
@@ -222,10 +212,9 @@ std::string advice(const Direction& direction, const Scene& scene, int status) {
         case QUO_NOT_SEEN:
             return ": the state vectors reach from " + iso_or_number(scene.first_time()) + " to " +
                    iso_or_number(scene.last_time()) +
-                   (direction.ground ? ""
-                    : direction.line_at < direction.outputs.size()
-                        ? ", and the Earth may hide the point, or no burst show it"
-                        : ", and the Earth may hide the point");
+                   (direction.ground        ? ""
+                    : direction.line_at > 0 ? ", and the Earth may hide the point, or no burst show it"
+                                            : ", and the Earth may hide the point");
         case QUO_NUMERIC:
             return ": no ground is there at that Doppler; range_time_s is two-way, in seconds";
         case QUO_REFUSED:
@@ -331,6 +320,7 @@ public:
         read(rows);
         require_solved(loaded_->clone(own_.get()));
         direction_->solve(*scene_, *own_, points_);
+        if (direction_->line_at > 0) find_pixels(*scene_, points_);
         write(rows);
         solved_.rows = static_cast<std::int64_t>(points_.count());
         solved_.bytes_read = rows.bytes_read;

@@ -6,6 +6,7 @@
 #include "product.h"
 #include "quo_base/derived_raster.h"
 #include "raster.h"
+#include "sarutillib/ground/letters.h"
 
 namespace tool {
 namespace {
@@ -126,20 +127,14 @@ void add_geometry(Facts& facts, const std::string& header, GeneralSAR& product) 
 }
 
 void add_objects(Facts& facts, const GeneralSAR& product) {
-    constexpr const char* kNames[] = {"GSDataFile",   "GSRoi",          "polySAR",         "SamplingConstants",
-                                      "StateVectors", "Orbit",          "Pulse",           "AntennaPattern",
-                                      "DataSetInfo",  "SensorAttitude", "SpectralWindows", "geoCoords",
-                                      "SwathInfo",    "BufferFile"};
     for (const bool present : {true, false}) {
-        nlohmann::ordered_json list = nlohmann::json::array();
-        std::string text;
+        std::vector<std::string> names;
         for (int i = 0; i < GeneralSAR::kObjects; ++i) {
-            if (product.GSexists(static_cast<GSObject>(i)) != present) continue;
-            list.push_back(kNames[i]);
-            text += (text.empty() ? "" : " ") + std::string{kNames[i]};
+            const auto object = static_cast<GSObject>(i);
+            if (product.GSexists(object) == present) names.emplace_back(GeneralSAR::GSname(object));
         }
-        const char* name = present ? "objects" : "absent";
-        facts.add(name, name, text.empty() ? "none" : text, list);
+        const char* which = present ? "objects" : "absent";
+        facts.add(which, which, names.empty() ? "none" : quo::joined(names, " "), names);
     }
 }
 

@@ -1,8 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quo_base/generalSAR.h"
 
+#include <algorithm>
+#include <array>
 #include <string>
 #include <string_view>
+#include <type_traits>
 
 #include "diagnosticslib/call_frame.h"
 #include "generalSAR/container/readable_file.h"
@@ -25,35 +28,52 @@ std::string side_file_of(const char* header) {
     return raster ? *raster + ".hdr" : "";
 }
 
-template <auto Object>
-int clone_object(GeneralSAR& from, GeneralSAR& to) {
-    return (from.*Object).clone(&(to.*Object));
+/** What is done with an object whatever its class. */
+struct Object {
+    const char* name;
+    GeneralSAR_Base* (*in)(GeneralSAR& product);
+    int (*clone)(GeneralSAR& from, GeneralSAR& to);
+};
+template <auto Member>
+constexpr Object object(const char* name) {
+    return {name, [](GeneralSAR& product) -> GeneralSAR_Base* { return &(product.*Member); },
+            [](GeneralSAR& from, GeneralSAR& to) {
+                if constexpr (std::is_same_v<decltype(Member), BufferFile GeneralSAR::*>)
+                    return (to.*Member).clone(&(from.*Member));  // the one that copies from its argument
+                else
+                    return (from.*Member).clone(&(to.*Member));
+            }};
 }
 // In the order of GSObject.
-constexpr int (*kClones[GeneralSAR::kObjects])(GeneralSAR&, GeneralSAR&) = {
-    clone_object<&GeneralSAR::dataFile>,
-    clone_object<&GeneralSAR::roi>,
-    clone_object<&GeneralSAR::polynomials>,
-    clone_object<&GeneralSAR::samplingConstants>,
-    clone_object<&GeneralSAR::stateVectors>,
-    clone_object<&GeneralSAR::orbit>,
-    clone_object<&GeneralSAR::pulse>,
-    clone_object<&GeneralSAR::antennaPattern>,
-    clone_object<&GeneralSAR::dataSetInfo>,
-    clone_object<&GeneralSAR::sensorAttitude>,
-    clone_object<&GeneralSAR::spectralWindows>,
-    clone_object<&GeneralSAR::geoCoords>,
-    clone_object<&GeneralSAR::swathInfo>,
-    // The one that copies from its argument.
-    [](GeneralSAR& from, GeneralSAR& to) { return to.bufferFile.clone(&from.bufferFile); },
+constexpr std::array<Object, GeneralSAR::kObjects> kTable{
+    object<&GeneralSAR::dataFile>("GSDataFile"),
+    object<&GeneralSAR::roi>("GSRoi"),
+    object<&GeneralSAR::polynomials>("polySAR"),
+    object<&GeneralSAR::samplingConstants>("SamplingConstants"),
+    object<&GeneralSAR::stateVectors>("StateVectors"),
+    object<&GeneralSAR::orbit>("Orbit"),
+    object<&GeneralSAR::pulse>("Pulse"),
+    object<&GeneralSAR::antennaPattern>("AntennaPattern"),
+    object<&GeneralSAR::dataSetInfo>("DataSetInfo"),
+    object<&GeneralSAR::sensorAttitude>("SensorAttitude"),
+    object<&GeneralSAR::spectralWindows>("SpectralWindows"),
+    object<&GeneralSAR::geoCoords>("geoCoords"),
+    object<&GeneralSAR::swathInfo>("SwathInfo"),
+    object<&GeneralSAR::bufferFile>("BufferFile"),
 };
 
 }  // namespace
 
 GeneralSAR::GeneralSAR()
-    : objects_{&dataFile,        &roi,       &polynomials,    &samplingConstants, &stateVectors,
-               &orbit,           &pulse,     &antennaPattern, &dataSetInfo,       &sensorAttitude,
-               &spectralWindows, &geoCoords, &swathInfo,      &bufferFile} {}
+    : objects_{[this] {
+          std::array<GeneralSAR_Base*, kObjects> objects{};
+          std::ranges::transform(kTable, objects.begin(), [this](const Object& row) { return row.in(*this); });
+          return objects;
+      }()} {}
+
+const char* GeneralSAR::GSname(GSObject object) noexcept {
+    return is_object(object) ? kTable[static_cast<std::size_t>(object)].name : "";
+}
 
 int GeneralSAR::GSread(const char* file) {
     quo::CallFrame frame{"GeneralSAR::GSread", kSource};
@@ -128,7 +148,9 @@ int GeneralSAR::GSdisable(GSObject object) noexcept {
 
 bool GeneralSAR::GSexists(GSObject object) const noexcept { return is_object(object) && present_[object]; }
 
-int GeneralSAR::cloneObject(int index, GeneralSAR& other) { return kClones[index](*this, other); }
+int GeneralSAR::cloneObject(int index, GeneralSAR& other) {
+    return kTable[static_cast<std::size_t>(index)].clone(*this, other);
+}
 
 int GeneralSAR::GSclone(GeneralSAR* other) {
     quo::CallFrame frame{"GeneralSAR::GSclone", kSource};

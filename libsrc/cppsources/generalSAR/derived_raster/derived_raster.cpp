@@ -189,8 +189,7 @@ int region_image_grid(const GeneralSAR& product, ImageGrid_Obj& grid) noexcept {
     const bool fits = raster == nullptr || raster->NrOfLinesPerImage == 0 ||
                       (region.Lines == raster->NrOfLinesPerImage && region.Samples == raster->NrOfPixelsPerLine);
     if (!product.GSexists(gsRoi) || region.isNULL() != 0 || !fits) return frame.silent(QUO_REFUSED);
-    if (const int failed = grid.setRegion(region)) return frame.callee(failed);
-    return frame.success();
+    return quo::pass_on(frame, grid.setRegion(region));
 }
 
 int commit_derived(BufferFile& raster, const char* header, const RasterDerivation& how) {
@@ -209,7 +208,6 @@ int commit_derived(BufferFile& raster, const char* header, const RasterDerivatio
         quo::HeaderSession session{own.c_str(), header};
         const int placed = Placed{*product, raster, how}.write(header, own.c_str(), session);
         if (placed != QUO_OK) return frame.callee(placed);
-        if (const int status = raster.commit()) return frame.callee(status);
-        return frame.success();
+        return quo::pass_on(frame, raster.commit());
     });
 }

@@ -14,6 +14,7 @@
 #include "quo_base/geometry.h"
 #include "quo_base/roi.h"
 #include "quorelxmllib/field_table.h"
+#include "quorelxmllib/guarded.h"
 #include "sarutillib/ground/array_extents.h"
 
 namespace {
@@ -197,8 +198,7 @@ int Obj::setRegion(const ROI_Obj& region) {
     grid.FirstSample_s = region.FastStartTime;
     grid.SampleStep_s = region.FastTimeDelta;
     if (!grid.isComplete()) return frame.fail(QUO_REFUSED, kNoGrid);
-    if (const int status = grid.clone(this)) return frame.callee(status);
-    return frame.success();
+    return quo::pass_on(frame, grid.clone(this));
 }
 
 int Obj::getRegion(ROI_Obj* region, std::int32_t lines, std::int32_t samples) const {

@@ -13,6 +13,7 @@
 #include "quo_base/datafile.h"
 #include "quo_base/gen_utils.h"
 #include "quorelxmllib/field_table.h"
+#include "quorelxmllib/guarded.h"
 #include "roilib/rounding.h"
 #include "sarutillib/ground/bounded_text.h"
 
@@ -166,8 +167,7 @@ int SARPulse_Obj::writeChirp(const char* file) const {
     if (const int status = line.writebuffer(reinterpret_cast<const char*>(chirp.data()), n))
         return frame.callee(status);
     if (const int status = raster.close()) return frame.callee(status);
-    if (const int status = raster.write_hdr()) return frame.callee(status);
-    return frame.success();
+    return quo::pass_on(frame, raster.write_hdr());
 }
 
 QUO_HEADER_RECORD(SensorAttitude_Obj, attitude::kTable)

@@ -53,8 +53,7 @@ int Obj::clone(AntennaPattern_Obj* to) const {
     quo::CallFrame frame{"AntennaPattern_Obj::clone", kSource};
     if (to == this) return frame.success();
     if (const int status = kTable.copy(*this, *to)) return frame.fail(status, kNoMemory);
-    if (const int status = to->PatternFile.clone(&PatternFile)) return frame.callee(status);
-    return frame.success();
+    return quo::pass_on(frame, to->PatternFile.clone(&PatternFile));
 }
 
 int Obj::writehdr(const char* file) { return writeAuxiliaryFile(file, 1, kTable.section()); }
@@ -78,8 +77,7 @@ int Obj::readhdr(const char* file) {
     if (!raster) return frame.fail(QUO_REFUSED, "The header's name is no more than its ending");
     if (const int status = PatternFile.read_hdr(raster->c_str())) return frame.callee(status);
     PatternSamples = PatternFile.NrOfPixelsPerLine;
-    if (const int status = createBuffers()) return frame.callee(status);
-    return frame.success();
+    return quo::pass_on(frame, createBuffers());
 }
 
 int Obj::getPatternArray(float* pattern) {
@@ -120,8 +118,7 @@ int Obj::WritePatternArray() {
     BufferIO line{&file, 0, PatternSamples, 0, 1, FLOAT32};
     if (const int status = line.writebuffer(reinterpret_cast<const char*>(Pattern.data()), PatternSamples))
         return frame.callee(status);
-    if (const int status = file.close()) return frame.callee(status);
-    return frame.success();
+    return quo::pass_on(frame, file.close());
 }
 
 int Obj::getPatternENVI(const char* annex_file, int swath, int polarization) {

@@ -61,8 +61,7 @@ int Obj::writehdr(const char* file) {
         if (const int status = writeAuxiliaryFile(file, 1, kTable.section())) return frame.callee(status);
         for (const auto& [name, point] : kPoints)
             if (const int status = (this->*point).writehdr(file, name)) return frame.callee(status);
-        if (const int status = session.commit()) return frame.callee(status);
-        return frame.success();
+        return quo::pass_on(frame, session.commit());
     });
 }
 

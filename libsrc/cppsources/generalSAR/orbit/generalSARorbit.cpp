@@ -124,8 +124,7 @@ int Obj::destroyBuffers() {
 int Obj::writehdr(const char* file) {
     quo::CallFrame frame{"GeneralSAROrbit::writehdr", kSource};
     nSV_n = std::min(nSV_n, vectors_);
-    if (const int status = writeAuxiliaryFile(file, 1, kTable.section())) return frame.callee(status);
-    return frame.success();
+    return quo::pass_on(frame, writeAuxiliaryFile(file, 1, kTable.section()));
 }
 
 int Obj::readhdr(const char* file) {
@@ -173,8 +172,7 @@ int Obj::SVCreate(double timeFirst, double timeDelta, int nStateVectors) noexcep
     t0SV_s = timeFirst;
     dtSV_s = timeDelta;
     nSV_n = nStateVectors;
-    if (const int status = createBuffers()) return frame.callee(status);
-    return frame.success();
+    return quo::pass_on(frame, createBuffers());
 }
 
 int Obj::SVDestroy() noexcept { return destroyBuffers(); }
@@ -186,8 +184,7 @@ int Obj::computeApproximateSV() noexcept {
     if (model_) model_->drop();
     if (!model_ || model_->vectors() != nSV_n) return frame.fail(QUO_REFUSED, kTooFew);
     if (!quo::OrbitModel::valid_times(t0SV_s, dtSV_s, nSV_n)) return frame.fail(QUO_REFUSED, kBadTimes);
-    if (const int status = model_->build(states_of(*this), t0SV_s)) return frame.callee(status);
-    return frame.success();
+    return quo::pass_on(frame, model_->build(states_of(*this), t0SV_s));
 }
 
 int Obj::SVResample(double spacing) noexcept { return SVResample(spacing, nullptr); }

@@ -7,6 +7,7 @@
 #include "generalSAR/orbit/orbit_points.h"
 #include "quo_base/generalSARorbit.h"
 #include "quo_base/geo_grid.h"
+#include "quorelxmllib/guarded.h"
 
 namespace {
 
@@ -40,6 +41,14 @@ int fill_point(Obj& orbit, double azimuth, double range, geopoint& point) noexce
     point.IncidenceAngle = at.incidence_deg;
     point.LookAngle = at.look_deg;
     return QUO_OK;
+}
+
+/** One of the numbers, three at most, that a call fills in; not-a-number where it fails. */
+template <typename Call>
+double one_of(std::size_t which, Call call) noexcept {
+    double values[3] = {kNaN, kNaN, kNaN};
+    call(values);
+    return values[which];
 }
 
 }  // namespace
@@ -109,21 +118,15 @@ double* Obj::sat2earth(double t, double range, double doppler) noexcept {
 
 double Obj::sat2earthX(double t, double range) noexcept { return sat2earthX(t, range, 0.0); }
 double Obj::sat2earthX(double t, double range, double doppler) noexcept {
-    double xyz[3] = {kNaN, kNaN, kNaN};
-    sat2earth(t, range, doppler, xyz);
-    return xyz[0];
+    return one_of(0, [&](double* xyz) { sat2earth(t, range, doppler, xyz); });
 }
 double Obj::sat2earthY(double t, double range) noexcept { return sat2earthY(t, range, 0.0); }
 double Obj::sat2earthY(double t, double range, double doppler) noexcept {
-    double xyz[3] = {kNaN, kNaN, kNaN};
-    sat2earth(t, range, doppler, xyz);
-    return xyz[1];
+    return one_of(1, [&](double* xyz) { sat2earth(t, range, doppler, xyz); });
 }
 double Obj::sat2earthZ(double t, double range) noexcept { return sat2earthZ(t, range, 0.0); }
 double Obj::sat2earthZ(double t, double range, double doppler) noexcept {
-    double xyz[3] = {kNaN, kNaN, kNaN};
-    sat2earth(t, range, doppler, xyz);
-    return xyz[2];
+    return one_of(2, [&](double* xyz) { sat2earth(t, range, doppler, xyz); });
 }
 
 int Obj::sat2earthSquinted(double t, double range, double squint, double* xyz, double* time) noexcept {
@@ -173,9 +176,7 @@ int Obj::locate(quo::CallerFrame frame, const double xyz[3], double doppler, boo
     if (!finite_point(xyz) || !std::isfinite(0.5 * lambda_ * doppler))
         return frame.fail(QUO_REFUSED, kBadArgument);
     const quo::Target target{quo::load(xyz), lambda_, doppler};
-    if (const int status = quo::find_times(*model_, model_->cursor(), target, precise, t, rangeTime))
-        return frame.callee(status);
-    return frame.success();
+    return quo::pass_on(frame, quo::find_times(*model_, model_->cursor(), target, precise, t, rangeTime));
 }
 
 int Obj::earth2sat(const double xyz[3], double* t, double* rangeTime) noexcept {
@@ -197,18 +198,14 @@ int Obj::earth2satPrecise(const double xyz[3], double* t, double* rangeTime, dou
 }
 
 double Obj::earth2satRange(const double xyz[3]) noexcept {
-    double t = kNaN, range = kNaN;
-    earth2sat(xyz, &t, &range);
-    return range;
+    return one_of(1, [&](double* times) { earth2sat(xyz, times, times + 1); });
 }
 double Obj::earth2satRange(double x, double y, double z) noexcept {
     const double xyz[3] = {x, y, z};
     return earth2satRange(xyz);
 }
 double Obj::earth2satAzimuth(const double xyz[3]) noexcept {
-    double t = kNaN, range = kNaN;
-    earth2sat(xyz, &t, &range);
-    return t;
+    return one_of(0, [&](double* times) { earth2sat(xyz, times, times + 1); });
 }
 double Obj::earth2satAzimuth(double x, double y, double z) noexcept {
     const double xyz[3] = {x, y, z};
@@ -272,39 +269,27 @@ int Obj::SVGetSatSpeed(double t, double range, double* speed) noexcept {
 }
 
 double Obj::SVGetLat(double t, double range, double doppler) noexcept {
-    double latitude = kNaN, longitude = kNaN;
-    SVGetLatLon(t, range, doppler, &latitude, &longitude);
-    return latitude;
+    return one_of(0, [&](double* place) { SVGetLatLon(t, range, doppler, place, place + 1); });
 }
 double Obj::SVGetLat(double t, double range) noexcept { return SVGetLat(t, range, 0.0); }
 double Obj::SVGetLon(double t, double range, double doppler) noexcept {
-    double latitude = kNaN, longitude = kNaN;
-    SVGetLatLon(t, range, doppler, &latitude, &longitude);
-    return longitude;
+    return one_of(1, [&](double* place) { SVGetLatLon(t, range, doppler, place, place + 1); });
 }
 double Obj::SVGetLon(double t, double range) noexcept { return SVGetLon(t, range, 0.0); }
 double Obj::SVGetAnglesIncidence(double t, double range, double doppler) noexcept {
-    double incidence = kNaN, look = kNaN;
-    SVGetAngles(t, range, doppler, &incidence, &look);
-    return incidence;
+    return one_of(0, [&](double* angles) { SVGetAngles(t, range, doppler, angles, angles + 1); });
 }
 double Obj::SVGetAnglesIncidence(double t, double range) noexcept { return SVGetAnglesIncidence(t, range, 0.0); }
 double Obj::SVGetAnglesLook(double t, double range, double doppler) noexcept {
-    double incidence = kNaN, look = kNaN;
-    SVGetAngles(t, range, doppler, &incidence, &look);
-    return look;
+    return one_of(1, [&](double* angles) { SVGetAngles(t, range, doppler, angles, angles + 1); });
 }
 double Obj::SVGetAnglesLook(double t, double range) noexcept { return SVGetAnglesLook(t, range, 0.0); }
 double Obj::SVGetFR(double t, double range, double doppler) noexcept {
-    double rate = kNaN;
-    SVGetFR(t, range, doppler, &rate);
-    return rate;
+    return one_of(0, [&](double* rate) { SVGetFR(t, range, doppler, rate); });
 }
 double Obj::SVGetFR(double t, double range) noexcept { return SVGetFR(t, range, 0.0); }
 double Obj::SVGetSatSpeed(double t, double range, double doppler) noexcept {
-    double speed = kNaN;
-    SVGetSatSpeed(t, range, doppler, &speed);
-    return speed;
+    return one_of(0, [&](double* speed) { SVGetSatSpeed(t, range, doppler, speed); });
 }
 double Obj::SVGetSatSpeed(double t, double range) noexcept { return SVGetSatSpeed(t, range, 0.0); }
 

@@ -51,19 +51,11 @@ constexpr const char* kSetSection = "PolySAR";
 // No form of a polynomial in a file is shorter than this: a count that asks for more is not believed.
 constexpr std::int64_t kShortestPolynomial = 40;
 
-namespace plain {
-using Obj = poly;
-constexpr quo::FieldTable kTable{kSetSection, QUO_FIELD(pol),
-                                 QUO_FIELD(trg0, quo::element("trg0_s"), quo::unit("s")),
-                                 QUO_FIELD(taz0, quo::element("taz0_s"), quo::unit("s"))};
-}  // namespace plain
-
-namespace extended {
-using Obj = extended_poly;
-constexpr quo::FieldTable kTable{kSetSection, QUO_FIELD(pol),
-                                 QUO_FIELD(trg0, quo::element("trg0_s"), quo::unit("s")),
-                                 QUO_FIELD(taz0, quo::element("taz0_s"), quo::unit("s"))};
-}  // namespace extended
+/** One polynomial, plain or extended. */
+template <typename Obj>
+constexpr quo::FieldTable kOne{kSetSection, QUO_FIELD(pol),
+                               QUO_FIELD(trg0, quo::element("trg0_s"), quo::unit("s")),
+                               QUO_FIELD(taz0, quo::element("taz0_s"), quo::unit("s"))};
 
 namespace counts {
 using Obj = polySAR;
@@ -104,7 +96,7 @@ constexpr Quantity kQuantities[] = {
 
 int read_poly(poly& object, const char* file, const char* name, const Quantity& quantity) {
     if (object.poly::readpar(file, name) == QUO_OK) return QUO_OK;
-    return plain::kTable.of(object).read_profile(file, name, quantity.keys);
+    return kOne<poly>.of(object).read_profile(file, name, quantity.keys);
 }
 
 double value_around(const double* c, double x, double y) {
@@ -278,8 +270,8 @@ bool file_can_hold(const polySAR& set, const char* file) {
 
 }  // namespace
 
-QUO_RECORD(poly, plain::kTable)
-int poly::clone(poly* to) const { return plain::kTable.copy(*this, *to); }
+QUO_RECORD(poly, kOne<poly>)
+int poly::clone(poly* to) const { return kOne<poly>.copy(*this, *to); }
 int poly::EvaluatePoly(double rangeTime, double azimuthTime, double* value) const {
     *value = value_around(pol, rangeTime - trg0, azimuthTime - taz0);
     return QUO_OK;
@@ -330,8 +322,8 @@ int polyFR::readparold(const char* file, const char* section, int n) {
     return QUO_REFUSED;
 }
 
-QUO_RECORD(extended_poly, extended::kTable)
-int extended_poly::clone(extended_poly* to) const { return extended::kTable.copy(*this, *to); }
+QUO_RECORD(extended_poly, kOne<extended_poly>)
+int extended_poly::clone(extended_poly* to) const { return kOne<extended_poly>.copy(*this, *to); }
 int extended_poly::EvaluatePoly(double rangeTime, double azimuthTime, double* value) const {
     const double x = rangeTime - trg0, y = azimuthTime - taz0;
     const double* e = pol;
@@ -443,8 +435,7 @@ int polySAR::writehdr(const char* file) {
         const int status =
             each_polynomial(*this, [file](auto& each, const char* name) { return each.writepar(file, name); });
         if (status != QUO_OK) return frame.callee(status);
-        if (const int saved = session.commit()) return frame.callee(saved);
-        return frame.success();
+        return quo::pass_on(frame, session.commit());
     });
 }
 
@@ -466,8 +457,7 @@ int polySAR::readhdr(const char* file) {
             return frame.callee(status);
         const int status =
             each_polynomial(*this, [file](auto& each, const char* name) { return each.readpar(file, name); });
-        if (status != QUO_OK) return frame.callee(status);
-        return frame.success();
+        return quo::pass_on(frame, status);
     });
 }
 

@@ -11,6 +11,7 @@
 #include <span>
 #include <string>
 #include <string_view>
+#include <type_traits>
 #include <utility>
 #include <vector>
 
@@ -57,8 +58,6 @@ int with_product(const quo::SharedCall& function, const quo_product* handle, Use
     const auto product = open_products().find(handle);
     return product ? use(frame, *product) : frame.fail(QUO_REFUSED, kNotOpen);
 }
-
-int finish(quo::CallFrame& frame, int status) { return status ? frame.callee(status) : frame.success(); }
 
 // --- Opening ----------------------------------------------------------------------------------------------------
 
@@ -128,28 +127,12 @@ std::size_t length_of(const parElement& element) {
     return static_cast<std::size_t>(std::max<std::int32_t>(element.count, 0));
 }
 
-template <typename T>
-void copy_values(const parElement& element, double* to) {
-    std::copy_n(static_cast<const T*>(element.pointer), length_of(element), to);
-}
-
 /** Writes an element's values as numbers; false where they are none. */
 bool copy_numbers(const parElement& element, double* to) {
-    switch (element.type) {
-        case parElement::typeDouble:
-            copy_values<double>(element, to);
-            return true;
-        case parElement::typeFloat:
-            copy_values<float>(element, to);
-            return true;
-        case parElement::typeInt:
-            copy_values<std::int32_t>(element, to);
-            return true;
-        case parElement::typeString:
-        case parElement::typeNone:
-            break;
-    }
-    return false;
+    return element.withValues([to]<typename T>(std::span<T> values) {
+        if constexpr (std::is_arithmetic_v<T>) std::ranges::copy(values, to);
+        return std::is_arithmetic_v<T>;
+    });
 }
 
 // --- Geolocation ------------------------------------------------------------------------------------------------
@@ -165,7 +148,7 @@ int see_ground(quo::CallFrame& frame, const OpenProduct& product, const OrbitSam
                const OrbitGround& ground) {
     if (const char* missing = missing_geometry(product.header, true, samples.doppler_hz || ground.fm_rate_hz_s))
         return frame.fail(QUO_REFUSED, missing);
-    return finish(frame, product.header.orbit.sat2earth(samples, ground));
+    return quo::pass_on(frame, product.header.orbit.sat2earth(samples, ground));
 }
 
 // --- Pixels -----------------------------------------------------------------------------------------------------
@@ -343,7 +326,7 @@ int quo_product_to_radar(const quo_product* product, std::size_t count, const do
     return with_product("quo_product_to_radar", product, [&](quo::CallFrame& frame, const OpenProduct& open) {
         if (const char* missing = missing_geometry(open.header, false, doppler_hz != nullptr))
             return frame.fail(QUO_REFUSED, missing);
-        return finish(frame, open.header.orbit.earth2sat(targets, seen));
+        return quo::pass_on(frame, open.header.orbit.earth2sat(targets, seen));
     });
 }
 
@@ -355,7 +338,7 @@ int quo_product_pixels_to_times(const quo_product* product, std::size_t count, c
     return with_pixels(
         "quo_product_pixels_to_times", product, {count, inputs, outputs, status},
         [&](quo::CallFrame& frame, const OpenProduct& open) {
-            return finish(frame, open.grid.pixelTimes({count, line, sample}, {azimuth_s, range_s, status}));
+            return quo::pass_on(frame, open.grid.pixelTimes({count, line, sample}, {azimuth_s, range_s, status}));
         });
 }
 
@@ -366,8 +349,8 @@ int quo_product_times_to_pixels(const quo_product* product, std::size_t count, c
     const std::array outputs{line, later_line, sample};
     return with_pixels("quo_product_times_to_pixels", product, {count, inputs, outputs, status},
                        [&](quo::CallFrame& frame, const OpenProduct& open) {
-                           return finish(frame, open.grid.timePixels({count, azimuth_s, range_s},
-                                                                     {line, later_line, sample, status}));
+                           return quo::pass_on(frame, open.grid.timePixels({count, azimuth_s, range_s},
+                                                                           {line, later_line, sample, status}));
                        });
 }
 
@@ -425,7 +408,7 @@ int quo_product_ground_to_pixels(const quo_product* product, std::size_t count, 
                                                     {line, later_line, sample, status});
                            for (std::size_t i = 0; status && i < count; ++i)
                                if (seen[i] != QUO_OK) status[i] = seen[i];
-                           return finish(frame, placed);
+                           return quo::pass_on(frame, placed);
                        });
 }
 

@@ -20,6 +20,14 @@ inline std::string upper(std::string text) {
     return text;
 }
 
+/** The texts one after another, with something in between. */
+template <typename Texts>
+std::string joined(const Texts& texts, const char* between = ", ") {
+    std::string all;
+    for (const auto& text : texts) all.append(all.empty() ? "" : between).append(text);
+    return all;
+}
+
 }  // namespace quo
 
 #endif

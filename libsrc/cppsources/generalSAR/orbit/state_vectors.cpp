@@ -8,6 +8,7 @@
 #include "generalSAR/orbit/orbit_table.h"
 #include "quo_base/generalSARorbit.h"
 #include "quo_base/interp_orb.h"
+#include "quorelxmllib/guarded.h"
 
 namespace {
 
@@ -46,8 +47,7 @@ void Obj::drop_polynomials() noexcept {
 int Obj::writehdr(const char* file) {
     quo::CallFrame frame{"SAROrbitStateVectors_Obj::writehdr", kSource};
     nSV_n = std::min(nSV_n, vectors_);
-    if (const int status = writeAuxiliaryFile(file, 1, kTable.section())) return frame.callee(status);
-    return frame.success();
+    return quo::pass_on(frame, writeAuxiliaryFile(file, 1, kTable.section()));
 }
 
 int Obj::readhdr(const char* file) {
@@ -64,8 +64,7 @@ int Obj::SVCreate(double timeFirst, double timeDelta, int nStateVectors) noexcep
     t0SV_s = timeFirst;
     dtSV_s = timeDelta;
     nSV_n = nStateVectors;
-    if (const int status = createBuffers()) return frame.callee(status);
-    return frame.success();
+    return quo::pass_on(frame, createBuffers());
 }
 
 int Obj::SVDestroy() noexcept { return destroyBuffers(); }
