@@ -19,6 +19,7 @@ def test_copies_have_the_same_content_and_a_life_of_their_own(scene_file, tmp_pa
     product = Product(scene_file)
     product.add("PolySAR", ndc=2)
     product["PolySAR/DopplerCentroid-1"].update(pol=[1.5, 0, 0, 0, 2, 0, 0], trg0_s=0.0055, taz0_s=1e9 / 7)
+    product.add("RasterInfo", HeaderOffset=16)
     product.DataSetInfo.Description = "<né>"
     product.save(tmp_path / "copy.hdr", exact=True)
     for copy in (Product(tmp_path / "copy.hdr"), product.clone(), pickle.loads(pickle.dumps(product))):

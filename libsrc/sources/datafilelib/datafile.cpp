@@ -99,6 +99,11 @@ int pass(quo::CallFrame& frame, int status, int line = __builtin_LINE()) {
     return status == QUO_OK ? frame.success(line) : frame.callee(status, line);
 }
 
+std::int32_t nearest_int(std::int64_t value) {
+    using Limits = std::numeric_limits<std::int32_t>;
+    return static_cast<std::int32_t>(std::clamp<std::int64_t>(value, Limits::min(), Limits::max()));
+}
+
 bool converts(int cell_type) { return cell_type >= FLOAT_COMPLEX && cell_type <= INT16; }
 
 }  // namespace
@@ -121,6 +126,13 @@ void RasterDescription::refreshParameters() {
     kTable.register_all(*this);
 }
 
+void RasterDescription::showOffset() { stored_offset_ = nearest_int(HeaderOffset); }
+
+int RasterDescription::createBuffers() {
+    if (stored_offset_ != nearest_int(HeaderOffset)) HeaderOffset = stored_offset_;
+    return GeneralSAR_Base::createBuffers();
+}
+
 int RasterDescription::element_sizeof() const { return static_cast<int>(quo::sample_size(CellType)); }
 int RasterDescription::is_complex() const { return quo::is_complex_type(CellType) ? 1 : 0; }
 
@@ -131,6 +143,7 @@ void RasterDescription::copyDescription(const RasterDescription& from) {
     RowPrefix = from.RowPrefix;
     ByteOrder = from.ByteOrder;
     CellType = from.CellType;
+    showOffset();
 }
 
 int64_t RasterDescription::rasterSize() const {
@@ -139,19 +152,14 @@ int64_t RasterDescription::rasterSize() const {
 }
 
 int RasterDescription::readSection(const char* side_file) {
-    stored_offset_ = 0;
-    const bool found = readAuxiliaryFile(side_file, 1, kSection);
-    if (found) HeaderOffset = stored_offset_;
+    const bool found = readAuxiliaryFile(side_file, 1, kSection);  // createBuffers() takes the offset over
+    if (!found) showOffset();
     return found ? QUO_OK : QUO_REFUSED;
 }
 
 int RasterDescription::writeSection(const char* side_file) {
-    if (HeaderOffset < std::numeric_limits<std::int32_t>::min() ||
-        HeaderOffset > std::numeric_limits<std::int32_t>::max()) {
-        return QUO_REFUSED;
-    }
-    stored_offset_ = static_cast<std::int32_t>(HeaderOffset);
-    return writeAuxiliaryFile(side_file, 1, kSection);
+    showOffset();
+    return stored_offset_ == HeaderOffset ? writeAuxiliaryFile(side_file, 1, kSection) : QUO_REFUSED;
 }
 
 int RasterDescription::commitPair(quo::AtomicFile& raster, const char* side_file) {
@@ -364,8 +372,9 @@ int DataFile::read_hdr(const char* file_name) {
         const std::string side_file = sideFile();
         if (readSection(side_file.c_str()) == QUO_OK) return frame.success();
         if (quo::Record::unread(*this) == QUO_NO_MEMORY) return frame.callee(QUO_NO_MEMORY);
-        if (!read_profile(*this, side_file.c_str()))
-            return frame.fail(QUO_REFUSED, "The raster's side file is incomplete");
+        const bool complete = read_profile(*this, side_file.c_str());
+        showOffset();
+        if (!complete) return frame.fail(QUO_REFUSED, "The raster's side file is incomplete");
         return frame.success();
     });
 }
