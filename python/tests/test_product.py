@@ -2,7 +2,19 @@
 import pickle
 
 import pytest
-from quo_base import Error, FileError, NumericError, ParameterFile, Product, RasterWriter, Refused
+from quo_base import (
+    Configuration,
+    Coregistration,
+    Error,
+    FileError,
+    NumericError,
+    ParameterFile,
+    Product,
+    RasterWriter,
+    Refused,
+    Region,
+)
+from quo_base.models import review
 
 
 def test_fields_have_one_value_under_all_their_names(scene_file):
@@ -124,6 +136,9 @@ def test_files_that_are_no_header_are_named_with_the_line_of_the_defect(scene_fi
     for name, kind, said in (("cut", Refused, r"cut\.hdr: .*line \d+"), ("absent", FileError, r"absent\.hdr: ")):
         with pytest.raises(kind, match=said):
             Product(tmp_path / (name + ".hdr"))
+    for read in (Region.read, Coregistration.read, review, lambda name: Configuration.read(name, "AzimuthConf")):
+        with pytest.raises(FileError, match=r"absent\.hdr: No such file.*status 9"):
+            read(tmp_path / "absent.hdr")
 
 
 @pytest.mark.parametrize("wrong", ["a\0.hdr", "\udcff.hdr", b"\xff", 3])
