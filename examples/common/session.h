@@ -11,6 +11,8 @@
 #include <stdexcept>
 #include <string>
 #include <string_view>
+#include <system_error>
+#include <utility>
 #include <vector>
 
 #include "quo_base/ckerr.h"
@@ -80,6 +82,15 @@ inline void require_apart(const Files& given) {
     errno = 0;  // what looking left would count as an error of the next function of the library
 }
 
+/** Throws where a file to be read cannot be opened, with the reason of the system. Empty names are of no file. */
+inline void require_readable(const Files& given) {
+    for (const std::string& name : given.read) {
+        const bool is_file = name.empty() || std::ifstream{name}.is_open();
+        const int reason = std::exchange(errno, 0);  // it would count as an error of the library's next function
+        if (!is_file) throw Failure{name + ": " + std::generic_category().message(reason)};
+    }
+}
+
 /** The report and the log of a program, open as long as the object lives. Blocks that were allocated in between
  * and not freed are listed on the standard error stream at the end. */
 class Session {
@@ -105,7 +116,7 @@ public:
 
 /** Runs a program's job under a report, and returns the program's exit status. What the job throws becomes an
  * entry of the report and a line on the standard error stream. `files` are those that the job reads and writes;
- * nothing is opened unless they are apart, report and log included. */
+ * nothing is written unless they are apart, report and log included, and those to be read can be. */
 template <typename Job>
 int run_program(const char* title, Files files, const std::string& report, const std::string& log, int level,
                 Job&& job) {
@@ -113,6 +124,7 @@ int run_program(const char* title, Files files, const std::string& report, const
         files.written.push_back(report);
         if (!log.empty()) files.written.push_back(log);
         require_apart(files);
+        require_readable(files);
         const Session session{title, report, log, level};
         try {
             job();

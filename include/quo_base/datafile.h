@@ -61,6 +61,9 @@ public:
     [[nodiscard]] int element_sizeof() const;
     /** 1 for codes 0, 2, 4, 6 and 8, else 0. */
     [[nodiscard]] int is_complex() const;
+    /** Takes HeaderOffset over from its element, where that was set since the last reading, copying or writing.
+     * Returns 0. */
+    int createBuffers() override;
     /** Copies the six values of the description. */
     void copyDescription(const RasterDescription& from);
     /** Bytes from the start of the file to the end of the last line, or -1 when the description makes no raster: a
@@ -69,7 +72,7 @@ public:
 
     int32_t NrOfLinesPerImage = 0;  ///< lines
     int32_t NrOfPixelsPerLine = 0;  ///< samples per line
-    int64_t HeaderOffset = 0;       ///< bytes before the first line; side files hold 32 bits of it
+    int64_t HeaderOffset = 0;       ///< bytes before the first line; its element and side files hold 32 bits of it
     int32_t RowPrefix = 0;          ///< bytes before the samples of each line
     int32_t ByteOrder = 0;          ///< 1 big-endian ("MSBFirst"), 0 little-endian
     int32_t CellType = 0;           ///< RasterCellType
@@ -83,6 +86,8 @@ protected:
     __attribute__((visibility("hidden"))) bool readNames(const char* side_file);
     /** Writes it; 0 or a failing status, 1 also for a HeaderOffset that an integer of the file cannot hold. */
     int writeSection(const char* side_file);
+    /** Makes the element of HeaderOffset show it, where it is beyond 32 bits the nearest number that they hold. */
+    void showOffset();
     /** Makes a new raster and its side file, with this description, the files of their names, both or neither but
      * for what DataFile::copy() tells. An older side file keeps its other sections. 0; 1 as writeSection(); 5, 7;
      * 9 where the side file cannot be replaced. */
@@ -94,7 +99,7 @@ protected:
 private:
     struct __attribute__((visibility("hidden"))) Table;
 
-    int32_t stored_offset_ = 0;  // HeaderOffset as the side file holds it
+    int32_t stored_offset_ = 0;  // the element of HeaderOffset
 };
 
 /** A raster file with plain and buffered byte access.

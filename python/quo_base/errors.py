@@ -53,8 +53,9 @@ def from_failure(
 ) -> Error:
     """The exception for a failed call; the bindings raise it."""
     kind = _TYPES.get(status, FileError if system_error else Refused)
-    reasons = [doing, message, os.strerror(system_error) if system_error else ""]
-    text = ": ".join(dict.fromkeys(reason for reason in reasons if reason))
+    text = ": ".join(dict.fromkeys(reason for reason in (doing, message) if reason))
+    cause = os.strerror(system_error) if system_error else ""
+    text += f": {cause}" if cause not in text else ""
     error = kind(f"{text} (status {status})")
     error.status = status
     error.entry = ReportEntry(message, function, file, line) if message else None

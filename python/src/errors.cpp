@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "errors.h"
 
+#include <unistd.h>
+
 #include <exception>
 
 namespace quo_python {
@@ -20,6 +22,13 @@ void set_error(const Failure& failure, const char* doing) {
 }
 
 }  // namespace
+
+void explain_absence(Failure& failure, const std::string& file) {
+    if (access(file.c_str(), R_OK) == 0) return;
+    failure.status = QUO_NOT_OPENED;
+    failure.system_error = errno;
+    errno = 0;
+}
 
 void raise(const Failure& failure, const char* doing) {
     set_error(failure, doing);

@@ -5,6 +5,7 @@
 #include <pybind11/pybind11.h>
 
 #include <cerrno>
+#include <string>
 #include <utility>
 
 #include "quo_base/ckerr.h"
@@ -23,6 +24,9 @@ struct Failure {
     quorelReportEntry entry{};  ///< the call's own ERROR entry; empty where it made none
     int system_error = 0;       ///< what the system refused it; 0 where it refused nothing
 };
+
+/** Makes the failure to read a file one to open it, where it cannot be opened. */
+void explain_absence(Failure& failure, const std::string& file);
 
 /** Runs a call of the library, which gives a status, on objects that the interpreter's lock guards. */
 template <typename Call>
@@ -55,6 +59,15 @@ Failure attempt(Call&& call) {
 template <typename Call>
 void run(const char* doing, Call&& call) {
     if (const Failure failure = attempt(std::forward<Call>(call)); failure.status != QUO_OK) raise(failure, doing);
+}
+
+/** Runs a call that reads a file, as run(); a file that cannot be opened is told as that, whatever status the call
+ * had for it. */
+template <typename Call>
+void run_on_file(const std::string& file, Call&& call) {
+    Failure failure = attempt(std::forward<Call>(call));
+    if (failure.status == QUO_REFUSED) explain_absence(failure, file);
+    if (failure.status != QUO_OK) raise(failure, ("reading " + file).c_str());
 }
 
 /** Exceptions of the library become those of the package. */

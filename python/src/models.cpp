@@ -37,11 +37,11 @@ public:
         run_locked("copying an object", [&] { return object_->clone(copy.get()); });
         return copy;
     }
-    /** As it was read by `call(object)`. */
+    /** As it was read from a file by `call(object)`. */
     template <typename Call>
-    static Model read(Call call) {
+    static Model read(const std::string& file, Call call) {
         Model model;
-        run("reading an object", [&] { return call(*model.object_); });
+        run_on_file(file, [&] { return call(*model.object_); });
         return model;
     }
     /** Writes a copy by `call(object)`, whose status need not tell. */
@@ -103,11 +103,11 @@ void bind_region(py::module_& module) {
     py::class_<Region>(module, "Region")
         .def(py::init<>())
         .def("record", &Region::record)
-        .def_static(
-            "read",
-            [](const std::string& file, const std::string& section) {
-                return Region::read([&](ROI_Obj& roi) { return roi.read_roi(file.c_str(), section.c_str()); });
-            })
+        .def_static("read",
+                    [](const std::string& file, const std::string& section) {
+                        return Region::read(
+                            file, [&](ROI_Obj& roi) { return roi.read_roi(file.c_str(), section.c_str()); });
+                    })
         .def("write",
              [](const Region& self, const std::string& file, const std::string& section) {
                  self.write([&](ROI_Obj& roi) { return roi.write_roi(file.c_str(), section.c_str()); });
@@ -149,7 +149,8 @@ void bind_mapping(py::module_& module) {
         .def("record", &Mapping::record)
         .def_static("read",
                     [](const std::string& file) {
-                        return Mapping::read([&](Coregist& mapping) { return mapping.readpar(file.c_str()); });
+                        return Mapping::read(file,
+                                             [&](Coregist& mapping) { return mapping.readpar(file.c_str()); });
                     })
         .def("write",
              [](const Mapping& self, const std::string& file) {
@@ -194,7 +195,7 @@ public:
     }
     static Configuration read(const std::string& name, const std::string& file, int channel) {
         Configuration made{name};
-        run("reading a configuration", [&] { return made.record_->readpar(file.c_str(), channel); });
+        run_on_file(file, [&] { return made.record_->readpar(file.c_str(), channel); });
         return made;
     }
     void write(const std::string& file, int channel) const {
@@ -222,7 +223,7 @@ private:
 /** The records of a file, and what does not fit: section, name, reason of each. */
 py::tuple review(const std::string& file, int channel) {
     ConfigurationReview found;
-    run("looking a configuration through", [&] { return reviewConfiguration(file.c_str(), channel, found); });
+    run_on_file(file, [&] { return reviewConfiguration(file.c_str(), channel, found); });
     py::list findings;
     for (const ConfigurationFinding& finding : found.findings)
         findings.append(py::make_tuple(finding.section, finding.name, finding.reason));
@@ -255,8 +256,9 @@ void bind_models(py::module_& module) {
         .def("record", &Polynomial::record)
         .def_static("read",
                     [](const std::string& file, const std::string& name) {
-                        return Polynomial::read(
-                            [&](poly& polynomial) { return polynomial.readpar(file.c_str(), name.c_str()); });
+                        return Polynomial::read(file, [&](poly& polynomial) {
+                            return polynomial.readpar(file.c_str(), name.c_str());
+                        });
                     })
         .def("write",
              [](const Polynomial& self, const std::string& file, const std::string& name) {

@@ -2,7 +2,19 @@
 import pickle
 
 import pytest
-from quo_base import Error, FileError, NumericError, ParameterFile, Product, RasterWriter, Refused
+from quo_base import (
+    Configuration,
+    Coregistration,
+    Error,
+    FileError,
+    NumericError,
+    ParameterFile,
+    Product,
+    RasterWriter,
+    Refused,
+    Region,
+)
+from quo_base.models import review
 
 
 def test_fields_have_one_value_under_all_their_names(scene_file):
@@ -19,6 +31,7 @@ def test_copies_have_the_same_content_and_a_life_of_their_own(scene_file, tmp_pa
     product = Product(scene_file)
     product.add("PolySAR", ndc=2)
     product["PolySAR/DopplerCentroid-1"].update(pol=[1.5, 0, 0, 0, 2, 0, 0], trg0_s=0.0055, taz0_s=1e9 / 7)
+    product.add("RasterInfo", HeaderOffset=16)
     product.DataSetInfo.Description = "<né>"
     product.save(tmp_path / "copy.hdr", exact=True)
     for copy in (Product(tmp_path / "copy.hdr"), product.clone(), pickle.loads(pickle.dumps(product))):
@@ -123,6 +136,9 @@ def test_files_that_are_no_header_are_named_with_the_line_of_the_defect(scene_fi
     for name, kind, said in (("cut", Refused, r"cut\.hdr: .*line \d+"), ("absent", FileError, r"absent\.hdr: ")):
         with pytest.raises(kind, match=said):
             Product(tmp_path / (name + ".hdr"))
+    for read in (Region.read, Coregistration.read, review, lambda name: Configuration.read(name, "AzimuthConf")):
+        with pytest.raises(FileError, match=r"absent\.hdr: No such file.*status 9"):
+            read(tmp_path / "absent.hdr")
 
 
 @pytest.mark.parametrize("wrong", ["a\0.hdr", "\udcff.hdr", b"\xff", 3])

@@ -50,13 +50,10 @@ inline std::vector<std::pair<std::string, std::vector<std::string>>> contents(Ge
             all.emplace_back(part_name + field, std::vector<std::string>{});
             for (const auto value : values) all.back().second.push_back(digits(value));
         };
-        const auto* const raster = dynamic_cast<const RasterDescription*>(part);
         for (int i = 0; i < part->elementCount(); ++i)
-            if (const char* const field = part->element(i)->name;
-                raster && field == std::string_view{"HeaderOffset"})
-                add(field, std::vector{raster->HeaderOffset});  // its element is a copy, made for each file
-            else
-                all.emplace_back(name + field, values_of(*part->element(i)));
+            all.emplace_back(name + part->element(i)->name, values_of(*part->element(i)));
+        if (const auto* const raster = dynamic_cast<const RasterDescription*>(part))
+            add("offset", std::vector{raster->HeaderOffset});
         if (const auto* const p = dynamic_cast<const geopoint*>(part))
             add("members", std::vector{p->Latitude, p->Longitude, p->Height, p->IncidenceAngle, p->LookAngle});
         if (const auto* const pattern = dynamic_cast<const AntennaPattern_Obj*>(part))
@@ -105,6 +102,7 @@ inline void fill(GeneralSAR_BaseXML& object, int seed = 1) {
                 std::tie(p->Point[0], p->Point[1], p->Point[2], p->Point[3], p->Point[4]);
         if (auto* const raster = dynamic_cast<RasterDescription*>(part)) {
             raster->HeaderOffset = raster->RowPrefix + 29;
+            raster->copyDescription(*raster);  // the element shows it
             raster->ByteOrder = seed % 2;
             raster->CellType = seed == 1 ? SHORT_COMPLEX : INT16;
         }

@@ -9,6 +9,7 @@
 #include <charconv>
 #include <cmath>
 #include <limits>
+#include <system_error>
 
 #include "quorelxmllib/header_source.h"
 #include "sarutillib/ground/file_io.h"
@@ -54,10 +55,15 @@ std::optional<double> number_of(std::string_view text) {
 
 }  // namespace
 
+void refuse_opening(const std::string& file) {
+    const std::string cause = errno != 0 ? std::generic_category().message(errno) : "not a regular file";
+    throw MissionRefusal{QUO_NOT_OPENED, file + ": " + cause};
+}
+
 MissionXml::MissionXml(const std::string& file) : name_{file}, document_{nullptr} {
     errno = 0;
     const auto bytes = file_length(file.c_str());
-    if (!bytes) throw MissionRefusal{QUO_NOT_OPENED, file + ": cannot be opened"};
+    if (!bytes) refuse_opening(file);
     if (*bytes > kMostBytes) throw MissionRefusal{QUO_REFUSED, file + ": is too long for a product's description"};
     // By its bytes: a name would be read as an address, and what is compressed would be unpacked without a bound.
     const auto text = read_file(file.c_str(), kMostBytes);

@@ -28,6 +28,9 @@ private:
     int status_;
 };
 
+/** Refuses a file that cannot be opened, for the reason that errno holds. */
+[[noreturn]] void refuse_opening(const std::string& file);
+
 /** An XML file of a mission, in memory. */
 class MissionXml {
 public:

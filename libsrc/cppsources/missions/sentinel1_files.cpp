@@ -1,4 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <unistd.h>
+
 #include <algorithm>
 #include <filesystem>
 #include <set>
@@ -54,7 +56,10 @@ fs::path choose(const std::vector<fs::path>& all, const std::string& source, con
         fitting.push_back(file);
         left.insert(parts[1] + " " + parts[3]);
     }
-    if (all.empty()) throw MissionRefusal{QUO_REFUSED, source + ": holds no annotation of Sentinel-1"};
+    if (all.empty())
+        throw MissionRefusal{
+            QUO_REFUSED,
+            source + ": holds no annotation of Sentinel-1; name a folder *.SAFE, its manifest or an annotation"};
     if (fitting.empty())
         throw MissionRefusal{QUO_REFUSED,
                              source + ": no such swath and polarization; there are " + joined(offered)};
@@ -73,7 +78,7 @@ MissionFiles find_sentinel1_files(const std::string& source, const std::string& 
                                   const std::string& polarization) {
     std::error_code error;
     fs::path path{source};
-    if (!fs::exists(path, error)) throw MissionRefusal{QUO_NOT_OPENED, source + ": cannot be opened"};
+    if (access(source.c_str(), F_OK) != 0) refuse_opening(source);
     if (path.filename() == "manifest.safe") path = path.parent_path().empty() ? fs::path{"."} : path.parent_path();
     if (!fs::is_directory(path, error) && !is_annotation(path))
         throw MissionRefusal{QUO_REFUSED,

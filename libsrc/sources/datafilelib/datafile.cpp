@@ -5,6 +5,7 @@
 #include <array>
 #include <cerrno>
 #include <cstring>
+#include <limits>
 #include <new>
 #include <optional>
 #include <string>
@@ -54,6 +55,11 @@ quo::RegionLayout layout_of(const quo::RasterRegion& prefixes) {
     return {nullptr, 0, prefixes.piece, prefixes.piece, false};
 }
 
+std::int32_t nearest_int(std::int64_t value) {
+    using Limits = std::numeric_limits<std::int32_t>;
+    return static_cast<std::int32_t>(std::clamp<std::int64_t>(value, Limits::min(), Limits::max()));
+}
+
 bool converts(int cell_type) { return cell_type >= FLOAT_COMPLEX && cell_type <= INT16; }
 
 }  // namespace
@@ -75,12 +81,20 @@ struct RasterDescription::Table {
 QUO_RECORD(RasterDescription, Table::kTable)
 RasterDescription::~RasterDescription() = default;
 
+void RasterDescription::showOffset() { stored_offset_ = nearest_int(HeaderOffset); }
+
+int RasterDescription::createBuffers() {
+    if (stored_offset_ != nearest_int(HeaderOffset)) HeaderOffset = stored_offset_;
+    return GeneralSAR_Base::createBuffers();
+}
+
 int RasterDescription::element_sizeof() const { return static_cast<int>(quo::sample_size(CellType)); }
 int RasterDescription::is_complex() const { return quo::is_complex_type(CellType) ? 1 : 0; }
 
 void RasterDescription::copyDescription(const RasterDescription& from) {
     Table::kTable.copy(from, *this);
     HeaderOffset = from.HeaderOffset;
+    showOffset();
 }
 
 int64_t RasterDescription::rasterSize() const {
@@ -89,23 +103,26 @@ int64_t RasterDescription::rasterSize() const {
 }
 
 int RasterDescription::readSection(const char* side_file) {
-    stored_offset_ = 0;
-    const bool found = readAuxiliaryFile(side_file, 1, Table::kTable.section());
-    if (found) HeaderOffset = stored_offset_;
+    const std::int64_t before = std::exchange(HeaderOffset, 0);
+    showOffset();
+    const bool found =
+        readAuxiliaryFile(side_file, 1, Table::kTable.section());  // createBuffers() takes the offset over
+    if (!found) HeaderOffset = before;
+    showOffset();
     return found ? QUO_OK : QUO_REFUSED;
 }
 
 bool RasterDescription::readNames(const char* side_file) {
-    stored_offset_ = static_cast<std::int32_t>(HeaderOffset);
+    showOffset();
     const bool complete = Table::kTable.of(*this).read_whole_profile(side_file, Table::kTable.section());
     HeaderOffset = stored_offset_;
     return complete;
 }
 
 int RasterDescription::writeSection(const char* side_file) {
-    if (!std::in_range<std::int32_t>(HeaderOffset)) return QUO_REFUSED;
-    stored_offset_ = static_cast<std::int32_t>(HeaderOffset);
-    return writeAuxiliaryFile(side_file, 1, Table::kTable.section());
+    showOffset();
+    return stored_offset_ == HeaderOffset ? writeAuxiliaryFile(side_file, 1, Table::kTable.section())
+                                          : QUO_REFUSED;
 }
 
 int RasterDescription::commitPair(quo::AtomicFile& raster, const char* side_file) {

@@ -43,7 +43,7 @@ void read_product(const std::string& header, GeneralSAR& product) {
         if (product.GSexists(static_cast<GSObject>(object))) return;
     }
     if (described_raster(product) != nullptr) return;
-    refuse_header(header, QUO_OK, "holds no object of a product");
+    refuse_header(header, QUO_OK, "holds no object of a product: no section such as ROI or StateVectorData");
 }
 
 const GeneralSAR_Base& elements_of(GeneralSAR& product, GSObject object) { return *product.GSelements(object); }
@@ -60,22 +60,27 @@ const parElement* Fields::at(std::string_view field) const {
     return quo::element_at(grid_, field);
 }
 
-std::string Fields::list_for(std::string_view field) {
+std::string Fields::list_for(std::string_view field, const Document& header) {
+    const std::string wanted{field.substr(0, field.find('/'))};
     std::string fields, sections;
-    const auto append = [](std::string& list, std::string_view name) {
-        list.append(list.empty() ? "" : ", ").append(name);
+    const auto append = [&](std::string& list, std::string_view name, const std::string& path) {
+        if (header.has(path)) list.append(list.empty() ? "" : ", ").append(name);
     };
-    const auto look_at = [&](const GeneralSAR_Base& elements, std::string_view section) {
-        append(sections, section);
-        if (field.substr(0, field.find('/')) != section) return;
-        for (int i = 0; i < elements.elementCount(); ++i) append(fields, elements.element(i)->name);
+    const auto look_at = [&](const GeneralSAR_Base& elements, const std::string& section) {
+        append(sections, section, section);
+        for (int i = 0; section == wanted && i < elements.elementCount(); ++i)
+            append(fields, elements.element(i)->name, section + '/' + elements.element(i)->name);
     };
     for (int i = gsRoi; i < GeneralSAR::kObjects; ++i) {
         const auto object = static_cast<GSObject>(i);
         if (object != gsOrbit) look_at(elements_of(product_, object), section_of(product_, object));
     }
     look_at(grid_, grid_.element(0)->section);
-    return fields.empty() ? "; sections are " + sections : "; that section has " + fields;
+    const bool known = header.has(wanted);
+    const std::string& list = known ? fields : sections;
+    return (known ? "has no field " + std::string{field} + "; that section"
+                  : "has no section " + wanted + "; it") +
+           (list.empty() ? " has none that is known" : " has " + list);
 }
 
 bool Fields::is_numeric(std::string_view field) const {

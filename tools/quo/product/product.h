@@ -12,6 +12,8 @@
 
 namespace tool {
 
+class Document;
+
 /** Reads a product header. Throws Failure where the file cannot be read or holds no object of a product. */
 void read_product(const std::string& header, GeneralSAR& product);
 
@@ -25,8 +27,8 @@ class Fields {
 public:
     /** The element at a path such as "SamplingConstants/prf_hz"; null where no object has it. */
     const parElement* at(std::string_view field) const;
-    /** The fields of the section that a path names, else the sections that there are. */
-    std::string list_for(std::string_view field);
+    /** The registered fields of a path's section that a header has, else the sections that it has. */
+    std::string list_for(std::string_view field, const Document& header);
     /** Whether a field is known to hold numbers. */
     bool is_numeric(std::string_view field) const;
 

@@ -118,6 +118,7 @@ void count_losses(const T* from, std::size_t count, int cell_type, Losses& losse
 void read_description(const std::string& name, DataFile& raster) {
     const std::string side_file = name + ".hdr";
     require_regular_file(name);
+    if (!std::filesystem::exists(side_file) && Document::in(name)) throw Failure(name + ": describes no raster");
     require_regular_file(side_file);
     if (raster.read_hdr(name.c_str()) != QUO_OK)
         throw Failure(side_file + ": no complete description of a raster");

@@ -81,7 +81,8 @@ void Scene::require_even_vectors() const {
 }
 
 void Scene::use_wavelength(double wavelength_m) {
-    if (orbit_.setLambda(wavelength_m) != 0) throw WrongUse("a wavelength of " + exact(wavelength_m) + " m");
+    if (orbit_.setLambda(wavelength_m) != 0)
+        throw WrongUse("--wavelength " + exact(wavelength_m) + ": must be a number of metres above 0");
     wavelength_m_ = wavelength_m;
 }
 

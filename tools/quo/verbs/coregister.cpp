@@ -235,7 +235,8 @@ void add_coregister(Command& program) {
     command.details(kDetails);
     command.needs("MASTER", options.master, "Header of the master image");
     command.needs("SLAVE", options.slave, "Header of the slave image");
-    command.needs("-o,--output", options.output, "Header document to hold the section REGIST");
+    command.needs("-o,--output", options.output,
+                  "Header document to hold the section REGIST; may be MASTER or SLAVE");
     command.flag("--json", options.json, "Print JSON");
 }
 

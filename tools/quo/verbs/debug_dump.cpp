@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <algorithm>
 #include <array>
+#include <climits>
 #include <cstdint>
 #include <cstring>
 #include <filesystem>
@@ -129,7 +130,6 @@ Json as_json(const Dump& dump, const std::vector<Json>& values) {
 }
 
 int show_dump(const DumpOptions& options) {
-    if (options.values < 0) throw WrongUse("--values " + std::to_string(options.values));
     Dump dump{options.file};
     const std::vector<Json> values = dump.read(options.values);
     options.json ? print_json(as_json(dump, values)) : print(as_text(dump, values));
@@ -145,7 +145,8 @@ void add_debug_dump(Command& program) {
     auto [command, options] =
         add_verb(program, "debug-dump", "Prints the header words and the first values of a debug dump", show_dump);
     command.needs("FILE", options.file, "Dump written by write_debug");
-    command.takes("--values", options.values, "How many values", {.shows_default = true});
+    command.takes("--values", options.values, "How many values",
+                  {.shows_default = true, .within = {{0, INT_MAX}}});
     command.flag("--json", options.json, "Print JSON");
 }
 

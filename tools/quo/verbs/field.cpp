@@ -55,7 +55,7 @@ public:
         require_header_file(file_);
         is_array_ = read(options.field + "/val");
         if (!is_array_ && !read(options.field))
-            throw Failure(file_ + ": has no field " + options.field + Fields{}.list_for(options.field));
+            throw Failure(file_ + ": " + Fields{}.list_for(options.field, Document{file_}));
     }
 
     /** The values: in JSON those of an object's member, separated by commas, else lines. */
@@ -129,11 +129,12 @@ int set_field(const FieldOptions& given) {
     for (std::string& value : options.values) value = in_seconds(options.field, value);
     for (const std::string& value : options.values) {
         if (value.size() >= Document::kTextRoom) {
-            throw WrongUse("a value of " + std::to_string(value.size()) + " bytes");
+            throw WrongUse(options.header + ": " + options.field + ": a value of " + std::to_string(value.size()) +
+                           " bytes; headers hold at most " + std::to_string(Document::kTextRoom - 1));
         }
     }
     const std::string defect = defect_of(options);
-    if (!defect.empty()) throw WrongUse(options.field + ": " + defect);
+    if (!defect.empty()) throw WrongUse(options.header + ": " + options.field + ": " + defect);
     Document document{options.header};
     if (!document.has(options.field) && !options.create) {
         throw Failure(options.header + ": has no field " + options.field + " (--create makes it)");

@@ -22,15 +22,19 @@ constexpr std::size_t kMostPoints = 10'000'000;
 
 struct Pairs {
     std::vector<double> x, y;
-    std::string x_name, y_name;
+    std::string x_name, y_name, input;
 };
 
 Pairs read_points(const FitOptions& options) {
     Table table{options.input};
-    if (table.columns().size() < 2) throw Failure(table.input().name() + ": needs two columns");
+    if (table.columns().size() < 2) throw Failure(table.place_of_names() + ": needs two columns");
     const std::size_t xy[] = {options.x.empty() ? 0 : table.need(options.x),
                               options.y.empty() ? 1 : table.need(options.y)};
-    Pairs points{.x = {}, .y = {}, .x_name = table.columns()[xy[0]], .y_name = table.columns()[xy[1]]};
+    Pairs points{.x = {},
+                 .y = {},
+                 .x_name = table.columns()[xy[0]],
+                 .y_name = table.columns()[xy[1]],
+                 .input = table.input().name()};
     while (table.next()) {
         const std::vector<double> numbers = table.numbers(xy);
         if (points.x.size() == kMostPoints) throw Failure(table.place() + ": more than ten million points");
@@ -66,7 +70,8 @@ Fit fit_points(const Pairs& points, int degree) {
     fit.coefficients.resize(terms);
     const int status = lsq_fit(design.data(), static_cast<int>(points.x.size()), static_cast<int>(terms),
                                points.y.data(), fit.coefficients.data(), &fit.summary);
-    if (status != QUO_OK) throw Failure("the points cannot be fitted, status " + status_text(status));
+    if (status != QUO_OK)
+        throw Failure(points.input + ": the points cannot be fitted, status " + status_text(status));
     for (std::size_t k = 0; k < points.x.size(); ++k) fit.residuals.add(points.y[k] - fit.at(points.x[k]));
     return fit;
 }
@@ -116,12 +121,12 @@ nlohmann::ordered_json as_json(const Pairs& points, const Fit& fit) {
 int fit_table(const FitOptions& options) {
     const Pairs points = read_points(options);
     if (points.x.size() < static_cast<std::size_t>(options.degree) + 1)
-        throw Failure(std::to_string(points.x.size()) + " points do not determine degree " +
+        throw Failure(points.input + ": " + std::to_string(points.x.size()) + " points do not determine degree " +
                       std::to_string(options.degree));
     const Fit fit = fit_points(points, options.degree);
     options.json ? print_json(as_json(points, fit)) : print(as_text(points, fit));
     if (fit.summary.rank > options.degree) return kFine;
-    complain("the points determine only " + std::to_string(fit.summary.rank) + " of " +
+    complain(points.input + ": the points determine only " + std::to_string(fit.summary.rank) + " of " +
              std::to_string(options.degree + 1) + " coefficients; the others are 0");
     return kFindings;
 }

@@ -189,7 +189,7 @@ void check_use(const GeolocateOptions& options) {
         throw WrongUse("--pixels belongs to --to radar; --to ground takes columns line and sample");
     if (options.first && !options.pixels) throw WrongUse("--first belongs to --pixels");
     if (ground && options.height_m && !std::isfinite(*options.height_m))
-        throw WrongUse("a height of " + exact(*options.height_m) + " m");
+        throw WrongUse("--height " + exact(*options.height_m) + ": must be a finite number of metres");
     if (!ground && options.height_m) throw WrongUse("--height belongs to --to ground");
 }
 

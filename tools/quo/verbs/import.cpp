@@ -80,7 +80,8 @@ void add_import(Command& program) {
     command.needs("PRODUCT", options.source, "Folder *.SAFE, its manifest, or an annotation file");
     command.needs("OUT", options.raster, "Raster to make, with a header OUT.hdr");
     command.takes("--swath", options.swath, "Swath, such as IW1, where there are several",
-                  {.offers = {"IW1", "IW2", "IW3", "EW1", "EW2", "EW3", "EW4", "EW5"}});
+                  {.offers = {"IW1", "IW2", "IW3", "EW1", "EW2", "EW3", "EW4", "EW5", "S1", "S2", "S3", "S4", "S5",
+                              "S6", "WV1", "WV2"}});
     command.takes("--polarization", options.polarization, "Polarization, such as VV, where there are several",
                   {.offers = {"VV", "VH", "HH", "HV"}});
     command.takes("--orbit", options.orbit, "Orbit file whose vectors take the place of the annotation's");

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include <algorithm>
+#include <climits>
 #include <cmath>
 #include <filesystem>
 #include <numbers>
@@ -178,7 +179,6 @@ drawing::Picture with_frame(const drawing::Picture& picture, const QuicklookOpti
 // --- The verb ---------------------------------------------------------------------------------------------------
 
 void require_sense(const QuicklookOptions& options) {
-    if (options.width < 1) throw WrongUse("--width " + std::to_string(options.width));
     if (!options.title.empty() && !options.frame) throw WrongUse("--title: needs --frame, which shows it");
     if (options.world && options.frame) throw WrongUse("--world excludes --frame, whose pixels are no map's");
     if (options.world && options.picture == "-") throw WrongUse("--world: stands beside a picture with a name");
@@ -242,9 +242,9 @@ void add_quicklook(Command& program) {
     command.needs("OUT", options.picture, "Picture to write (PNG)");
     command.takes("--looks", options.looks, "Lines x samples averaged into a pixel, such as 4x1");
     command.takes("--db", options.db, "Black and white: MIN:MAX in dB, or auto (percentiles)",
-                  {.offers = {"auto"}});
+                  {.offers = {"auto", "MIN:MAX"}});
     command.takes("--width", options.width, "Greatest width in pixels, in place of --looks (1000)",
-                  {.excludes = "--looks"});
+                  {.excludes = "--looks", .within = {{1, INT_MAX}}});
     command.flag("--north-up", options.north_up,
                  "Turn and mirror it so that north is nearest to the top; say how");
     command.flag("--world", options.world, "Write a world file beside it: longitude and latitude of its pixels");

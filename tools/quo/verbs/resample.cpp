@@ -289,7 +289,7 @@ void add_resample(Command& program) {
         add_verb(program, "resample", "Changes the number of samples or lines of a raster of any size", resample);
     command.needs("IN", options.in, "Raster with a side file IN.hdr");
     command.needs("OUT", options.out, "Raster to write, with a side file OUT.hdr");
-    Command size = command.either("New size", "What OUT has more or fewer of");
+    Command size = command.either("One of these", "What OUT has more or fewer of: one of --samples, --lines");
     size.takes("--samples", options.samples, "Samples per line", {.within = {{1, INT_MAX}}});
     size.takes("--lines", options.lines, "Lines", {.within = {{1, INT_MAX}}});
     command.takes("--centre", options.centre, "Centre of the band in cycles per sample, where it is not 0",

@@ -11,6 +11,7 @@
 
 #include "apart.h"
 #include "commands.h"
+#include "document.h"
 #include "interrupt.h"
 #include "output.h"
 #include "progress.h"
@@ -185,6 +186,7 @@ struct Rates {
 
 Rates rates_of(const std::string& header) {
     if (header.empty()) return {};
+    require_header_file(header);
     // The image's own rates; those of the constants are the recording's, which bursts and multilooked images
     // leave.
     GeneralSAR product;
