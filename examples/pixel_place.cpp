@@ -6,7 +6,10 @@
 
 int main() {
     quo_product* product = nullptr;
-    if (quo_product_open("scene.hdr", nullptr, &product) != 0) return 1;
+    if (quo_product_open("scene.hdr", nullptr, &product) != 0) {
+        std::fprintf(stderr, "scene.hdr: no product that can be read\n");
+        return 1;
+    }
     const double line[] = {1501, 1501}, sample[] = {5675, 12000}, height_m[] = {0, 350};
     double latitude[2], longitude[2];
     int32_t status[2];

@@ -12,8 +12,9 @@ from quo_base import Product
 
 def main(header, height="0"):
     product = Product(header)
-    region = product.ROI
-    lines, samples = region.Lines - 1, region.Samples - 1
+    # Of bursts, which overlap in time, the raster has more lines than the region.
+    shape = product.raster.shape if "RasterInfo" in product else (product.ROI.Lines, product.ROI.Samples)
+    lines, samples = shape[0] - 1, shape[1] - 1
     line = np.array([0, 0, lines, lines, lines / 2])
     sample = np.array([0, samples, samples, 0, samples / 2])
     times = product.grid.times(line, sample)

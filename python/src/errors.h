@@ -65,7 +65,13 @@ void run(const char* doing, Call&& call) {
  * had for it. */
 template <typename Call>
 void run_on_file(const std::string& file, Call&& call) {
-    Failure failure = attempt(std::forward<Call>(call));
+    Failure failure;
+    try {
+        failure = attempt(std::forward<Call>(call));
+    } catch (const quorelException&) {
+        explain_absence(failure, file);
+        if (failure.status == QUO_OK) throw;
+    }
     if (failure.status == QUO_REFUSED) explain_absence(failure, file);
     if (failure.status != QUO_OK) raise(failure, ("reading " + file).c_str());
 }

@@ -137,7 +137,7 @@ def test_files_that_are_no_header_are_named_with_the_line_of_the_defect(scene_fi
         with pytest.raises(kind, match=said):
             Product(tmp_path / (name + ".hdr"))
     for read in (Region.read, Coregistration.read, review, lambda name: Configuration.read(name, "AzimuthConf")):
-        with pytest.raises(FileError, match=r"absent\.hdr: No such file.*status 9"):
+        with pytest.raises(FileError, match=r"absent\.hdr: .*No such file.*status 9"):
             read(tmp_path / "absent.hdr")
 
 

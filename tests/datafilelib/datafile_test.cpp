@@ -42,6 +42,9 @@ TEST(SideFile, ComesBackFieldByFieldInBothClasses) {
     buffer_cloned.getFilename(copied);
     EXPECT_EQ(copied, name);
     EXPECT_EQ(cloned.FileName, name);
+    test::write_text(side, "[RasterInfo]\nHeaderOffset = 77\n");  // the older form, from which the rest is missing
+    EXPECT_EQ(read.read_hdr(name.c_str()), 1);
+    EXPECT_EQ(*static_cast<const std::int32_t*>(read.element(2)->pointer), 77);
 }
 
 // Raster and side file. A copy to a new name was open to all whatever its source was; and only the rasters were
