@@ -38,10 +38,14 @@ void require_header_file(const std::string& file) {
         throw Failure(file + ": is larger than 1 GiB, the limit of a header");
 }
 
-void refuse_header(const std::string& file, int status, const std::string& cause) {
+void refuse_unread(const std::string& file, int status) {
     if (status == QUO_NO_MEMORY) throw Failure(file + ": does not fit into memory");
     if (const int error = quo_take_system_error())
         throw Failure(file + ": cannot be read: " + std::generic_category().message(error));
+}
+
+void refuse_header(const std::string& file, int status, const std::string& cause) {
+    refuse_unread(file, status);
     throw Failure(file + ": " + xml_defect_or(file, cause));
 }
 
