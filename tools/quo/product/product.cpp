@@ -47,10 +47,7 @@ bool holds_objects(GeneralSAR& product) {
 bool read_objects(const std::string& header, GeneralSAR& product) {
     forget_system_error();
     if (const int status = product.GSread(header.c_str())) refuse_header(header, status, "cannot be read");
-    if (!holds_objects(product)) {
-        refuse_unread(header, QUO_OK);
-        return false;
-    }
+    if (!holds_objects(product)) return false;  // the caller may still ask for the system's reason
     if (quo_take_system_error() == ENOMEM) refuse_unread(header, QUO_NO_MEMORY);
     return true;
 }
