@@ -27,16 +27,25 @@ def make_map(path):
             file.write(heights[line:line + 50], 1, window=((line, line + 50), (0, SAMPLES)))
 
 
+def start(jobs):
+    child = os.fork()
+    if child == 0:
+        run(jobs, progress=None)
+        os._exit(0)
+    return child
+
+
 with tempfile.TemporaryDirectory() as folder:
     output = os.path.join(folder, "map.tif")
     jobs = [Job(output, make_map)]
+    begun = time.monotonic()
+    os.waitpid(start(jobs), 0)
+    took_s = time.monotonic() - begun
+    os.remove(output)
     whole = 0
     for moment in range(int(sys.argv[1])):
-        child = os.fork()
-        if child == 0:
-            run(jobs, progress=None)
-            os._exit(0)
-        time.sleep(random.Random(moment).uniform(0.0, 0.12))
+        child = start(jobs)
+        time.sleep(random.Random(moment).uniform(0.0, 1.3 * took_s))
         os.kill(child, signal.SIGKILL)
         os.waitpid(child, 0)
         found = os.path.exists(output)

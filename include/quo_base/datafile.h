@@ -333,8 +333,9 @@ public:
     int write(const void* src, int n);
     /** Copies n bytes from the place of another file, open for reading, to the place of this one, as they stand;
      * the system copies them where it can. Both places move on by n. 0; 1 while either file is not open for that,
-     * for this file itself and for n < 0; 4 where the source cannot be read or ends before, which its status()
-     * then tells; 5, 7. After a failure the places stay, and some bytes may have been written. */
+     * for this file itself, for ranges of one file on disk that overlap and for n < 0; 4 where the source cannot
+     * be read or ends before, which its status() then tells; 5, 7. After a failure the places stay, and some bytes
+     * may have been written. */
     int copyFrom(BufferFile& source, int64_t n);
 
     /** @name Blocks

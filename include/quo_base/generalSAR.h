@@ -60,7 +60,8 @@ public:
      * its look direction from the data set.
      * @return 0, whatever was found; 1 with the ERROR entry "File : %s DOES NOT EXIST!" where the file cannot be
      *         opened, with nothing changed; 7. An object that memory is short for, or whose file is there but
-     *         cannot be read, is not present, with an ERROR entry. */
+     *         cannot be read, is not present, with an ERROR entry; quo_take_system_error() then gives
+     *         ENOMEM where memory was short. */
     int GSread(const char* file);
     /** Writes the present objects, the last of GSObject first, each into its own section, which it replaces; other
      * content of the file stays. An existing header is parsed once, and all sections are saved in one step, so

@@ -57,6 +57,18 @@ std::vector<std::string> sections_of(const GeneralSAR& all, Wanted wanted) {
     return sections;
 }
 
+/** Status of putting an object's texts into a document in memory, which XML may have no form for. */
+int put_texts(quorelxml& document, const GeneralSAR_Base& object) {
+    for (int i = 0; i < object.elementCount(); ++i) {
+        const parElement& element = *object.element(i);
+        if (element.type != parElement::typeString || element.count < 1) continue;
+        const auto* const single = static_cast<const char*>(element.pointer);
+        const char* const* const texts = element.text_array ? static_cast<char**>(element.pointer) : &single;
+        if (const int status = document.writeString(1, "Texts", texts, element.count)) return status;
+    }
+    return QUO_OK;
+}
+
 }  // namespace
 
 // --- Files ------------------------------------------------------------------------------------------------------
@@ -106,7 +118,13 @@ void Header::write(const std::string& file, bool exact) const {
 }
 
 int Header::write_all(const std::string& file, bool exact) {
-    for (const std::string& section : sections()) record(section)->object().setExactNumbers(exact);
+    quorelxml texts{file.c_str()};
+    for (const std::string& section : sections()) {
+        GeneralSAR_Base& object = record(section)->object();
+        if (put_texts(texts, object) != QUO_OK)
+            return QUO_WRITE_FAILED;  // sections before this one would be saved
+        object.setExactNumbers(exact);
+    }
     const int status = all_.GSwrite(file.c_str());
     return status == QUO_OK && grid_listed_ ? grid_.writehdr(file.c_str()) : status;
 }

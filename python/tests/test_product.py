@@ -127,6 +127,7 @@ def test_failures_tell_status_and_report_entry(scene_file, tmp_path, status, kin
         doing(Product(scene_file), tmp_path)
     assert caught.value.status == status and caught.value.entry.message in str(caught.value)
     assert caught.value.system_error == (getattr(caught.value, "errno", None) or 0)
+    assert not list(tmp_path.iterdir())
     copy = pickle.loads(pickle.dumps(caught.value))
     assert isinstance(copy, Error) and copy.entry == caught.value.entry
 

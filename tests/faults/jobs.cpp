@@ -342,8 +342,9 @@ Run import_product(Folder folder) {
 }
 
 constexpr auto kOldOrNew = test::Promise::kOldOrNew, kReports = test::Promise::kReports,
-               kUnchanged = test::Promise::kUnchanged, kTells = test::Promise::kTells,
-               kSurvives = test::Promise::kSurvives, kSilent = test::Promise::kSilent;
+               kUnchanged = test::Promise::kUnchanged, kLists = test::Promise::kLists,
+               kTells = test::Promise::kTells, kSurvives = test::Promise::kSurvives,
+               kSilent = test::Promise::kSilent;
 
 }  // namespace
 
@@ -398,9 +399,14 @@ const std::vector<test::Job>& test::jobs() {
                                  {"ReadRegion", kUnchanged, read_region},
                                  {"Compute", kUnchanged, compute}};
 #ifdef QUO_TOOL
-        for (const auto& row : read_table("fault_verbs.txt", '|'))
-            jobs.push_back({row[0], row[1] == "reads" ? kUnchanged : kOldOrNew, nullptr,
-                            row[1].find("killed") != row[1].npos, row[2]});
+        for (const auto& row : read_table("fault_verbs.txt", '|')) {
+            const auto does = [&](const char* word) { return row[1].find(word) != row[1].npos; };
+            jobs.push_back({row[0],
+                            does("reads")   ? kUnchanged
+                            : does("lists") ? kLists
+                                            : kOldOrNew,
+                            nullptr, does("killed"), row[2], !does("without memory")});
+        }
 #endif
         return jobs;
     }();

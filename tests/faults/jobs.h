@@ -13,6 +13,7 @@ enum class Promise {
     kReports,    ///< the same, but the status is always 0 and the report tells
     kSilent,     ///< the same, but nothing tells
     kUnchanged,  ///< all old: the job reads, and gives 0 only with what is in the files
+    kLists,      ///< the same, but what it lists may tell instead of a message, by the system's own words
     kTells,      ///< writes where the file stands: 0 only where it is new
     kSurvives    ///< nothing more than not to crash
 };
@@ -24,6 +25,7 @@ struct Job {
     Run (*prepare)(const std::string& folder) = nullptr;  ///< does what is to be done without faults
     bool killed = false;                                  ///< whether it is killed at random as well
     std::string verb = {};                                ///< a run of the tool instead; "@" stands for the folder
+    bool takes_memory = true;                             ///< whether memory is refused
 };
 const std::vector<Job>& jobs();
 void PrintTo(const Job& job, std::ostream* stream);

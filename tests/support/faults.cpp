@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "support/faults.h"
 
+#include <dlfcn.h>
 #include <linux/filter.h>
 #include <linux/seccomp.h>
 #include <sys/mman.h>
@@ -19,6 +20,8 @@
 #include <cstring>
 #include <iterator>
 #include <stdexcept>
+
+#include "support/failing_memory.h"
 
 // The one place whose system calls the filter lets through: number and six arguments, as the kernel takes them.
 extern "C" long quo_system_call(long number, const long* arguments);
@@ -83,6 +86,7 @@ constexpr Row kRows[] = {
 
 test::Watch* watched = nullptr;
 std::array<bool, 1024> in_folder{};  // by descriptor
+bool refusing_waits = false;         // of a preloaded program, for the first file that it looks at
 
 using Arguments = std::array<long, 6>;
 
@@ -141,6 +145,12 @@ long fail(const Row& row, Arguments arguments) {
     return -error;
 }
 
+void refuse_memory_now() {
+    refusing_waits = false;
+    watched->reached = true;  // should the refusal end the process
+    test::refuse_memory(watched->fault.nth - 1, !watched->fault.forever);
+}
+
 void handle(int /*signal*/, siginfo_t* about, void* context) {
     auto& registers = static_cast<ucontext_t*>(context)->uc_mcontext.gregs;
     const Arguments arguments{registers[REG_RDI], registers[REG_RSI], registers[REG_RDX],
@@ -148,10 +158,12 @@ void handle(int /*signal*/, siginfo_t* about, void* context) {
     long result = -ENOSYS;
     for (const Row& row : kRows) {
         if (row.number != about->si_syscall) continue;
-        if (!concerns_folder(row, arguments))
+        if (!concerns_folder(row, arguments)) {
             result = quo_system_call(row.number, arguments.data());
-        else
-            result = strikes(row) ? fail(row, arguments) : perform(row, arguments);
+            continue;
+        }
+        result = strikes(row) ? fail(row, arguments) : perform(row, arguments);
+        if (refusing_waits) refuse_memory_now();
     }
     registers[REG_RAX] = result;
 }
@@ -192,9 +204,29 @@ bool install_filter() {
     void* const shared = mmap(nullptr, sizeof(test::Watch), PROT_READ | PROT_WRITE, MAP_SHARED, number, 0);
     if (shared == MAP_FAILED) std::abort();
     test::start_watching(static_cast<test::Watch*>(shared));
+    refusing_waits = watched->fault.call == Call::kMemory;
+}
+/** The main program, which runs where it uses no file as well. */
+int (*actual_main)(int, char**, char**) = nullptr;
+int run_main(int count, char** arguments, char** environment) {
+    if (refusing_waits && !watched->uses_files) refuse_memory_now();
+    return actual_main(count, arguments, environment);
+}
+[[gnu::destructor]] void tell_of_memory() {
+    if (watched && watched->fault.call == Call::kMemory && !refusing_waits)
+        watched->reached = test::stop_refusing();
 }
 
 }  // namespace
+
+// What static objects of a program take is taken before its main function, which could not help it.
+extern "C" [[gnu::visibility("default")]] int __libc_start_main(decltype(actual_main) main, int count,
+                                                                char** arguments, void (*begin)(), void (*end)(),
+                                                                void (*end_of_libraries)(), void* stack) {
+    const auto next = reinterpret_cast<decltype(&__libc_start_main)>(dlsym(RTLD_NEXT, "__libc_start_main"));
+    actual_main = main;
+    return next(run_main, count, arguments, begin, end, end_of_libraries, stack);
+}
 
 void test::start_watching(Watch* watch) {
     watched = watch;

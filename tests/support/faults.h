@@ -4,7 +4,8 @@
 
 /* System calls that fail on demand, whoever makes them: the library, libc or libxml2. A filter of the kernel hands
  * every call of interest to a handler of the process; those that concern one folder are counted and, where the
- * fault says so, fail. A program that cannot be changed gets the handler as a preloaded library. */
+ * fault says so, fail. A program that cannot be changed gets the handler as a preloaded library, together with the
+ * allocator of failing_memory.h. */
 
 namespace test {
 
@@ -48,6 +49,7 @@ struct Watch {
     long counted[2][static_cast<int>(Call::kNever)];  ///< calls of each kind; of them those that move bytes
     long descriptors;                                 ///< of files in the folder that are open
     bool reached;                                     ///< the fault has happened
+    bool uses_files;                                  ///< of a preloaded program: it has memory up to the first
     bool returned;                                    ///< the job came back: what is open then stays open
     bool blocks;                                      ///< it left tracked memory
 };

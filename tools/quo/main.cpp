@@ -1,4 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <cstdlib>
+#include <exception>
 #include <filesystem>
 #include <new>
 #include <span>
@@ -69,9 +71,23 @@ int run(int argc, char** argv) {
     }
 }
 
+/** For destructors that take memory, such as those of JSON values, where there is none. */
+[[noreturn]] void end_without_memory() {
+    try {
+        if (const auto thrown = std::current_exception()) std::rethrow_exception(thrown);
+    } catch (const std::bad_alloc&) {
+        tool::complain("out of memory");
+        std::_Exit(tool::kFindings);
+    } catch (...) {
+        std::abort();
+    }
+    std::abort();
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
+    std::set_terminate(end_without_memory);
     try {
         return run(argc, argv);
     } catch (const tool::Interrupted& interrupted) {

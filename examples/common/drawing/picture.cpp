@@ -13,7 +13,7 @@ namespace {
 class PngWriter {
 public:
     PngWriter()
-        : png_{png_create_write_struct(PNG_LIBPNG_VER_STRING, nullptr, nullptr, nullptr)},
+        : png_{png_create_write_struct(PNG_LIBPNG_VER_STRING, nullptr, give_up, nullptr)},
           info_{png_ ? png_create_info_struct(png_) : nullptr} {
         if (!info_) {
             png_destroy_write_struct(&png_, nullptr);
@@ -42,6 +42,8 @@ public:
     [[nodiscard]] const std::string& bytes() const { return bytes_; }
 
 private:
+    /** In place of libpng's own, which prints. */
+    [[noreturn]] static void give_up(png_structp png, png_const_charp /*why*/) { png_longjmp(png, 1); }
     static void append(png_structp png, png_bytep data, std::size_t size) {
         static_cast<PngWriter*>(png_get_io_ptr(png))->bytes_.append(reinterpret_cast<const char*>(data), size);
     }

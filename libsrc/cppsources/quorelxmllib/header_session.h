@@ -52,6 +52,8 @@ public:
     static void fail_all(int status) noexcept;
     /** How often that was said. */
     [[nodiscard]] int failures() const noexcept { return failures_; }
+    /** The status of the latest failure. */
+    [[nodiscard]] int failed() const noexcept { return failed_; }
 
     /** The file's document, parsed at the first call; null, and 7 in `status`, when it does not fit into memory. A
      * missing or foreign file gives a fresh document, and one that cannot be read a document that only stands in.
@@ -81,6 +83,7 @@ public:
     [[nodiscard]] bool save(AtomicFile& file) { return session_->save(file); }
     /** See HeaderSession::failures. */
     [[nodiscard]] int failures() const noexcept { return session_->failures(); }
+    [[nodiscard]] int failed() const noexcept { return session_->failed(); }
 
 private:
     HeaderSession* session_;

@@ -22,8 +22,6 @@ constexpr int kHeaderOptions = XML_PARSE_NOBLANKS | XML_PARSE_COMPACT | XML_PARS
 class XmlErrors {
 public:
     XmlErrors() noexcept {
-        static const bool ready = (xmlInitParser(), true);  // by one thread, before others parse
-        (void)ready;
         handler_ = xmlStructuredError;
         context_ = xmlStructuredErrorContext;
         xmlSetStructuredErrorFunc(this, [](void* self, xmlError* error) {
@@ -31,6 +29,8 @@ public:
             if (error->code == XML_ERR_NO_MEMORY) errors.out_of_memory_ = true;
             if (errors.line_ == 0) errors.note(*error);
         });
+        static const bool ready = (xmlInitParser(), true);  // by one thread, before others parse
+        (void)ready;
     }
     ~XmlErrors() { xmlSetStructuredErrorFunc(context_, handler_); }
     XmlErrors(const XmlErrors&) = delete;

@@ -347,6 +347,7 @@ int BufferFile::copyFrom(BufferFile& source, int64_t n) {
     if (!source.flush()) return source.status_;
     if (!flush()) return status_;
     const int status = n > 0 ? quo::copy_range(*source.stream_, source.place(), *stream_, place(), n) : QUO_OK;
+    if (status == QUO_REFUSED) return status;
     (status == QUO_READ_FAILED ? source : *this).note(status);
     if (status != QUO_OK) n = 0;
     source.dropBuffer(source.place() + n);

@@ -258,6 +258,11 @@ int write_region(const RasterStream& stream, const RasterRegion& region, const R
 
 int copy_range(const RasterStream& from, std::int64_t place, const RasterStream& to, std::int64_t to_place,
                std::int64_t bytes) {
+    struct stat source {
+    }, target{};
+    if (::fstat(from.descriptor(), &source) != 0 || ::fstat(to.descriptor(), &target) != 0) return QUO_READ_FAILED;
+    const bool one_file = source.st_dev == target.st_dev && source.st_ino == target.st_ino;
+    if (one_file && std::abs(place - to_place) < bytes) return QUO_REFUSED;
     const auto copied =
         static_cast<std::int64_t>(from.copy_to(place, to, to_place, static_cast<std::size_t>(bytes)));
     if (copied == bytes) return QUO_OK;

@@ -52,7 +52,8 @@ int read_region(const RasterStream& stream, const RasterRegion& region, const Re
 int write_region(const RasterStream& stream, const RasterRegion& region, const RegionLayout& layout,
                  const char* from);
 
-/** Copies bytes of one file to a place of another. 0, 4 also where the source ends before, 5, or 7. */
+/** Copies bytes of one file to a place of another. 0, 1 for ranges of one file that overlap, of which pieces would
+ * be read after they were written, 4 also where the source ends before, 5, or 7. */
 int copy_range(const RasterStream& from, std::int64_t place, const RasterStream& to, std::int64_t to_place,
                std::int64_t bytes);
 

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "document.h"
 
+#include <cerrno>
 #include <cstdint>
 #include <filesystem>
 #include <fstream>
@@ -11,6 +12,8 @@
 
 namespace tool {
 namespace {
+
+constexpr const char* kDoesNotFit = ": does not fit into memory";
 
 /** What is no XML in a file, and on which line, where XML is what it means to be, else `cause`. */
 std::string xml_defect_or(const std::string& file, const std::string& cause) {
@@ -38,10 +41,20 @@ void require_header_file(const std::string& file) {
         throw Failure(file + ": is larger than 1 GiB, the limit of a header");
 }
 
+void refuse_unread(const std::string& file, int status) {
+    const int error = quo_take_system_error();
+    if (status == QUO_NO_MEMORY || error == ENOMEM) throw Failure(file + kDoesNotFit);
+    if (error != 0) throw Failure(file + ": cannot be read: " + std::generic_category().message(error));
+}
+
 void refuse_header(const std::string& file, int status, const std::string& cause) {
-    if (status == QUO_NO_MEMORY) throw Failure(file + ": does not fit into memory");
-    if (const int error = quo_take_system_error())
-        throw Failure(file + ": cannot be read: " + std::generic_category().message(error));
+    try {
+        refuse_unread(file, status);
+    } catch (const Failure& failure) {
+        // A text that libxml2 finds too long looks like a lack of memory: the document's defect says more.
+        if (status == QUO_NO_MEMORY || failure.what() != file + kDoesNotFit) throw;
+        throw Failure(file + ": " + xml_defect_or(file, kDoesNotFit + 2));
+    }
     throw Failure(file + ": " + xml_defect_or(file, cause));
 }
 

@@ -17,6 +17,10 @@ void require_regular_file(const std::string& file);
  * device, not to be opened, or too large. */
 void require_header_file(const std::string& file);
 
+/** Throws Failure where a call of the library that answered `status` found no memory, or the system refused to
+ * read the file. forget_system_error() comes before the call. */
+void refuse_unread(const std::string& file, int status);
+
 /** Throws Failure for a header that a call of the library answered `status` for: with the system's reason where
  * the file could not be read, which looks like an empty one otherwise, else with what is no XML in it, else with
  * `cause`. forget_system_error() comes before the call. */

@@ -2,7 +2,9 @@
 #include "product.h"
 
 #include <algorithm>
+#include <cerrno>
 #include <cmath>
+#include <new>
 
 #include "date.h"
 #include "document.h"
@@ -33,24 +35,38 @@ std::string type_of(const DataSetInfo_Obj& info, const std::string& otherwise) {
     return otherwise;
 }
 
+bool holds_objects(GeneralSAR& product) {
+    for (int object = gsRoi; object < GeneralSAR::kObjects; ++object) {
+        if (product.GSexists(static_cast<GSObject>(object))) return true;
+    }
+    return described_raster(product) != nullptr;
+}
+
 }  // namespace
+
+bool read_objects(const std::string& header, GeneralSAR& product) {
+    forget_system_error();
+    if (const int status = product.GSread(header.c_str())) refuse_header(header, status, "cannot be read");
+    if (!holds_objects(product)) return false;  // the caller may still ask for the system's reason
+    if (quo_take_system_error() == ENOMEM) refuse_unread(header, QUO_NO_MEMORY);
+    return true;
+}
 
 void read_product(const std::string& header, GeneralSAR& product) {
     require_header_file(header);
-    forget_system_error();
-    if (const int status = product.GSread(header.c_str())) refuse_header(header, status, "cannot be read");
-    for (int object = gsRoi; object < GeneralSAR::kObjects; ++object) {
-        if (product.GSexists(static_cast<GSObject>(object))) return;
-    }
-    if (described_raster(product) != nullptr) return;
-    refuse_header(header, QUO_OK, "holds no object of a product: no section such as ROI or StateVectorData");
+    if (!read_objects(header, product))
+        refuse_header(header, QUO_OK, "holds no object of a product: no section such as ROI or StateVectorData");
 }
 
-const GeneralSAR_Base& elements_of(GeneralSAR& product, GSObject object) { return *product.GSelements(object); }
+const GeneralSAR_Base& elements_of(GeneralSAR& product, GSObject object) {
+    const GeneralSAR_Base& elements = *product.GSelements(object);
+    if (elements.elementCount() == 0)
+        throw std::bad_alloc{};  // all register some, where there is room for the list
+    return elements;
+}
 
 const char* section_of(GeneralSAR& product, GSObject object) {
-    const parElement* element = elements_of(product, object).element(0);
-    return element != nullptr ? element->section : "";
+    return elements_of(product, object).element(0)->section;
 }
 
 const parElement* Fields::at(std::string_view field) const {

@@ -14,6 +14,9 @@ namespace tool {
 
 class Document;
 
+/** Reads the objects of a header; whether there are any. Throws Failure where it cannot be read, or an object that
+ * is there does not fit into memory. */
+bool read_objects(const std::string& header, GeneralSAR& product);
 /** Reads a product header. Throws Failure where the file cannot be read or holds no object of a product. */
 void read_product(const std::string& header, GeneralSAR& product);
 

@@ -52,7 +52,7 @@ Scene::Scene(const std::string& header, Vectors vectors) : name_{header} {
     // In one go: of a file that can be read at one time and not at another, a wavelength that was not found would
     // count as one that is not there.
     GeneralSAR product;
-    if (product.GSread(name_.c_str()) != 0) throw Failure(name_ + ": cannot be read");
+    (void)read_objects(name_, product);
     take_orbit(product);
     if (vectors == Vectors::kEvenOnly) require_even_vectors();
     const double wavelength_m = product.samplingConstants.lambda_m;

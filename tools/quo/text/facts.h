@@ -34,7 +34,7 @@ public:
 
 private:
     std::vector<std::pair<std::string, std::string>> lines_;
-    Json json_;
+    Json json_ = Json::object();
 };
 
 }  // namespace tool

@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
+#include <new>
 #include <system_error>
 
 #include "quo_base/ckerr.h"
@@ -43,9 +44,13 @@ std::string library_cause(int status) {
     return error != 0 ? std::generic_category().message(error) : "status " + status_text(status);
 }
 
-void complain(const std::string& message) {
-    const std::string line = shown("quo: " + message) + '\n';
-    std::fwrite(line.data(), 1, line.size(), stderr);
+void complain(std::string_view message) noexcept {
+    try {
+        const std::string line = "quo: " + shown(message) + '\n';
+        std::fwrite(line.data(), 1, line.size(), stderr);
+    } catch (const std::bad_alloc&) {
+        std::fputs("quo: out of memory\n", stderr);
+    }
 }
 
 }  // namespace tool

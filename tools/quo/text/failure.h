@@ -4,6 +4,7 @@
 
 #include <stdexcept>
 #include <string>
+#include <string_view>
 
 #include "quo_base/ckerr.h"
 
@@ -47,8 +48,9 @@ void require_done(const std::string& file, const char* cannot, Call call) {
     if (const int status = call()) throw Failure(file + ": " + cannot + ": " + library_cause(status));
 }
 
-/** Writes "quo: message" as one line to standard error. */
-void complain(const std::string& message);
+/** Writes "quo: message" as one line to standard error; "quo: out of memory" where there is none to make that
+ * line. */
+void complain(std::string_view message) noexcept;
 
 }  // namespace tool
 

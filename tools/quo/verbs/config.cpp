@@ -1,4 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <unistd.h>
+
 #include <algorithm>
 #include <filesystem>
 #include <fstream>
@@ -137,16 +139,18 @@ public:
         std::error_code error;
         folder_ = (std::filesystem::temp_directory_path(error) / "quo_config_XXXXXX").string();
         if (error) fail(error.message());
+        name_.reserve(folder_.size() + std::size(kName));  // nothing must fail between the folder and its end
         if (!mkdtemp(folder_.data())) fail(system_cause());
+        name_.append(folder_).append(kName);
     }
     ~ScratchFile() {
-        std::error_code ignored;
-        std::filesystem::remove_all(folder_, ignored);
+        (void)unlink(name_.c_str());
+        (void)rmdir(folder_.c_str());
     }
     ScratchFile(const ScratchFile&) = delete;
     ScratchFile& operator=(const ScratchFile&) = delete;
 
-    [[nodiscard]] std::string name() const { return folder_ + "/configuration.xml"; }
+    [[nodiscard]] const std::string& name() const { return name_; }
     void take_file() const {
         std::error_code error;
         std::filesystem::copy_file(file_, name(), error);
@@ -164,7 +168,9 @@ private:
         throw Failure(file_ + ": cannot be prepared among the temporary files: " + cause);
     }
 
-    std::string file_, folder_;
+    static constexpr char kName[] = "/configuration.xml";
+
+    std::string file_, folder_, name_;
 };
 
 ConfigurationReview review_of(const std::string& file) {
@@ -233,15 +239,19 @@ int show(const ConfigOptions& options) {
     if (review.records.empty()) throw Failure(options.file + ": holds no record");
     Listing listing;
     GeneralSAR_BaseConfiguration shared, fresh_shared;
+    forget_system_error();
     shared.readConf(options.file.c_str(), kConfigChannel, shared.sharedParameter(0).section);
+    refuse_unread(options.file, QUO_OK);  // the call itself tells nothing
     listing.add("shared", shared_parameters(shared), shared_parameters(fresh_shared));
     int status = kFine;
     for (const std::string& name : review.records) {
         const auto record = record_of(name), fresh = record_of(name);
+        forget_system_error();
         try {
             record->readpar(options.file.c_str(), kConfigChannel);
             listing.add(name, parameters_of(*record), parameters_of(*fresh));
         } catch (const quorelException&) {
+            refuse_unread(options.file, QUO_OK);
             complain(options.file + ": " + name + " is incomplete; quo config check tells what is missing");
             status = kFindings;
         }

@@ -32,9 +32,9 @@ struct QuicklookOptions {
 /** What the header beside a raster tells of it. */
 struct Described {
     explicit Described(const std::string& header) {
+        const bool any = read_objects(header, product);
         try {
-            if (product.GSread(header.c_str()) == QUO_OK && Pixels::known(header, product))
-                pixels.emplace(header, product);
+            if (any && Pixels::known(header, product)) pixels.emplace(header, product);
         } catch (const Failure&) {
             return;  // a grid that makes none takes nothing from the picture itself
         }

@@ -2,6 +2,7 @@
 #include <algorithm>
 #include <climits>
 #include <complex>
+#include <filesystem>
 #include <memory>
 #include <numbers>
 #include <optional>
@@ -99,6 +100,17 @@ private:
     std::optional<Transform> forward_, inverse_;
 };
 
+/** Throws Failure where a raster is larger than what its disk has left, as far as the system knows that. */
+void require_room(const std::string& name, const RasterDescription& raster) {
+    std::error_code unknown;
+    const auto place = std::filesystem::weakly_canonical(std::filesystem::absolute(name, unknown), unknown);
+    const auto disk = std::filesystem::space(place.parent_path(), unknown);
+    const auto size = static_cast<std::uintmax_t>(std::max<std::int64_t>(raster.rasterSize(), 0));
+    if (!unknown && disk.capacity > 0 && size > disk.available)
+        throw Failure(name + ": needs " + std::to_string(size) + " bytes, its disk has " +
+                      std::to_string(disk.available) + " left");
+}
+
 /** The description of the raster that the options ask for. */
 class Wanted : public RasterDescription {
 public:
@@ -172,6 +184,8 @@ private:
     // Each line is an image of its own, so that nothing depends on how many are read at once.
     void by_lines() {
         const Size from{in_.NrOfPixelsPerLine, 1}, into{to().NrOfPixelsPerLine, 1};
+        const Resampler can_be_had{from, into, options_.centre};
+        require_room(options_.out, to());
         int line = 0;
         const auto next = [&]() -> std::optional<Part> {
             throw_if_interrupted();
@@ -191,6 +205,7 @@ private:
         const int width = static_cast<int>(std::clamp<std::int64_t>(fitting, 1, samples));
         const Size from{width, lines_in}, into{width, lines_out};
         const Resampler can_be_had{from, into, options_.centre};
+        require_room(options_.out, to());
         take_room();
         std::int64_t begun = 0;
         const auto next = [&]() -> std::optional<Part> {

@@ -232,7 +232,9 @@ private:
     // Where the pixel grid places the raster.
     void check_grid() {
         const RasterDescription* raster = described_raster(product_);
+        forget_system_error();
         const int status = read_image_grid(header_.c_str(), product_, grid_);
+        if (status != QUO_OK) refuse_unread(header_, status);
         if (status != QUO_OK && status != QUO_REFUSED) return error("ImageGrid", "-", "makes no pixel grid");
         if (status != QUO_OK || raster == nullptr) return;
         if (grid_.getRegion(&placed_, raster->NrOfLinesPerImage, raster->NrOfPixelsPerLine) != QUO_OK)

@@ -292,7 +292,7 @@ struct Described {
 };
 Described describe(const std::string& header) {
     GeneralSAR product;
-    if (product.GSread(header.c_str()) != QUO_OK) return {};
+    if (!read_objects(header, product)) return {};
     const Told told{product};
     Described described;
     described.before_band = metadata(told);
@@ -367,6 +367,9 @@ int write_vrt(const std::string& name) {
     } else {
         require_apart(raster_files(name), {name + ".vrt"});
         write_output(name + ".vrt", raw_vrt(raster, file, described));
+        std::error_code ignored;
+        std::filesystem::remove(name + ".rows.vrt",
+                                ignored);  // of an older raster of bursts: nothing leads there now
     }
     if (described.damage.empty()) return kFine;
     complain(described.damage + "; the image has no control points");

@@ -82,6 +82,7 @@ int GeneralSAR::GSread(const char* file) {
         const quo::JoinedSession session{file};
         const quo::ProfileLook look{file};
         GSdestroy();
+        bool lacks_memory = false;
         for (int i = 0; i < kObjects; ++i) {
             const int failures = session.failures();
             const int status = quo::guarded(frame, [&] { return objects_[i]->readhdr(file); });
@@ -90,9 +91,12 @@ int GeneralSAR::GSread(const char* file) {
             if (session.failures() == failures) continue;
             // Some objects answer 0 whatever they found, and some without a word.
             present_[i] = false;
+            lacks_memory = lacks_memory || session.failed() == QUO_NO_MEMORY;
             (void)frame.fail(QUO_READ_FAILED, "An object of the product cannot be read");
         }
         linkObjects();
+        // The status must be 0: this is how callers tell an object that did not fit from one that is not there.
+        if (lacks_memory) errno = ENOMEM;
         return frame.success();
     });
 }
