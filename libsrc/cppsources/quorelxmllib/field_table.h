@@ -26,6 +26,8 @@ template <typename... Uses>
 struct ForTypes : Uses... {
     using Uses::operator()...;
 };
+template <typename... Uses>
+ForTypes(Uses...) -> ForTypes<Uses...>;
 
 /** How a field takes part in the parameter-file fallback. */
 enum class InProfile : std::uint8_t { kMandatory, kOptional, kAbsent };
