@@ -35,7 +35,8 @@ def draw_map(axes, whole, places):
     for name, (east, north) in places.items():
         axes.plot(east, north, "o", markersize=14, markerfacecolor="none", markeredgecolor="tab:orange")
         axes.annotate(name, (east, north), (8, 8), textcoords="offset points", color="tab:orange")
-    axes.set(aspect="equal", xlabel="east, m", ylabel="north, m", title=f"Brightest in {COARSE_M * GATHERED:.0f} m")
+    title = f"Brightest in {COARSE_M * GATHERED:.0f} m"
+    axes.set(aspect="equal", xlabel="east, m", ylabel="north, m", title=title)
     axes.ticklabel_format(useOffset=False, style="plain")
     axes.locator_params(nbins=5)
 
