@@ -13,8 +13,8 @@ LINES, SAMPLES = 400, 1000
 
 
 def make_scene(scene_file):
-    """A product scene.hdr of speckle through which parallels and meridians run at every hundredth of a degree, and a
-    model of flat ground in it, dem.tif; its samples."""
+    """A product scene.hdr of speckle through which parallels and meridians run at every hundredth of a degree, and
+    a model of flat ground in it, dem.tif; its samples."""
     product = Product(scene_file)
     product.ROI.update(Lines=LINES, Samples=SAMPLES)
     times = product.grid.times(np.arange(LINES)[:, np.newaxis], np.arange(SAMPLES))
@@ -47,7 +47,8 @@ def draw_a_map_of_islands(scene_map, folder):
     import make_map
 
     rows = ["name,latitude_deg,longitude_deg,height_m"]
-    rows += [f"{i}{j},{scene_map.y.values[i]},{scene_map.x.values[j]},30" for i in (60, 150, 240) for j in (60, 150, 240)]
+    at = (60, 150, 240)
+    rows += [f"{i}{j},{scene_map.y.values[i]},{scene_map.x.values[j]},30" for i in at for j in at]
     (folder / "places.csv").write_text("\n".join(rows))
     elevation_model.main("places.csv", "islands.tif")
     make_map.main("scene.hdr", "islands.tif", "places.csv", "islands.png")
@@ -71,8 +72,9 @@ def test_the_examples_of_the_page_run(scene_file, tmp_path, monkeypatch, capsys)
         exec(block, shown)
     assert shown["ground"].status.sum() == 0 and shown["scene_map"].image.shape == (300, 300)
     assert np.array_equal(names["block"], samples[100:150, ::2]) and names["seen"].status.sum() == 0
-    assert names["scene_map"]["image"].shape == (300, 300) and [each.state for each in names["outcomes"]] == ["made"]
-    assert names["power"].shape == (LINES,) and names["fit"].rank == 3 and (tmp_path / "maps.png").stat().st_size > 1e4
+    assert names["scene_map"]["image"].shape == (300, 300) and names["power"].shape == (LINES,)
+    assert [each.state for each in names["outcomes"]] == ["made"] and names["fit"].rank == 3
+    assert (tmp_path / "maps.png").stat().st_size > 1e4
     monkeypatch.syspath_prepend(ROOT / "examples" / "python")
     import geolocate
     import line_profile
@@ -82,7 +84,8 @@ def test_the_examples_of_the_page_run(scene_file, tmp_path, monkeypatch, capsys)
     geolocate.main("scene.hdr")
     line_profile.main("scene.hdr", "64")
     told = capsys.readouterr().out
-    assert told.count("incidence") == 5 and f"{LINES} lines, mean power {np.mean(np.abs(samples) ** 2):.4g}"[:-1] in told
+    power = np.mean(np.abs(samples) ** 2)
+    assert told.count("incidence") == 5 and f"{LINES} lines, mean power {power:.4g}"[:-1] in told
     maps_on_workers.make_map("map.tif", "scene.hdr", "dem.tif")
     monkeypatch.setattr("sys.argv", ["", "dem.tif", ".", "scene.hdr", "--scheduler"])
     with distributed.LocalCluster(n_workers=1, processes=False, dashboard_address=None) as cluster:
