@@ -13,7 +13,7 @@ libcairo2-dev libtiff-dev libfftw3-dev pybind11-dev python3-dev python3-numpy py
 python3-xarray python3-dask gdal-bin"
 tests="git libgtest-dev libgmock-dev libbenchmark-dev liblapack-dev libeigen3-dev clang-format clang-tidy clang libclang-rt-dev
 valgrind time abigail-tools dpkg-dev file lintian help2man doxygen python3-pytest python3-pip
-python3-distributed python3-pyflakes zsh"
+python3-distributed python3-pyflakes pycodestyle zsh"
 case "${1:-}" in
 "") packages="$packages $tests" ;;
 --demo) ;;

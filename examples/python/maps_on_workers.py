@@ -1,6 +1,6 @@
 # SPDX-License-Identifier: Apache-2.0
-"""Maps of several products at a time, as raster files with their reference system: on two processes of this machine,
-or on a cluster whose scheduler's address is told. Running it again does what is left.
+"""Maps of several products at a time, as raster files with their reference system: on two processes of this
+machine, or on a cluster whose scheduler's address is told. Running it again does what is left.
 
 The elevation model's heights are above the ellipsoid.
 

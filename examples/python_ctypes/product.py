@@ -1,5 +1,5 @@
 # SPDX-License-Identifier: Apache-2.0
-"""A product from Python with the standard library alone: ctypes loads the shared library and calls its C functions.
+"""A product from Python with the standard library alone: ctypes loads the library and calls its C functions.
 
 Usage: product.py LIBRARY HEADER AZIMUTH_S RANGE_S
 """
@@ -83,7 +83,8 @@ def main(library, header, azimuth_s, range_s):
     with Product(library, header) as product:
         (prf_hz,) = product.numbers("SamplingConstants/prf_hz")
         positions = product.numbers("StateVectorData/pSV_m")
-        print(f"{product.text('DataSetInfo/SensorName')}, PRF {prf_hz:.3f} Hz, {len(positions) // 3} state vectors")
+        vectors = len(positions) // 3
+        print(f"{product.text('DataSetInfo/SensorName')}, PRF {prf_hz:.3f} Hz, {vectors} state vectors")
         ranges = [float(range_s) + 1e-4 * i for i in range(3)]
         latitude, longitude, incidence = product.to_ground([float(azimuth_s)] * 3, ranges)
         for place in zip(latitude, longitude, incidence, *product.to_radar(latitude, longitude)):

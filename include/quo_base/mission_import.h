@@ -30,7 +30,8 @@ typedef struct quo_import_request {
 typedef struct quo_tie_points {
     int32_t count;   /**< tie points that were compared: of those that the annotation has, but for the ones that no
                           burst shows or that are more than a pixel off; 0 where there are none, and then all
-                          is 0 */
+                          but `stated` is 0 */
+    int32_t stated;  /**< tie points that the annotation has */
     double rms_line; /**< root mean square of the lines' differences */
     double most_line;     /**< the largest of them */
     double rms_sample;    /**< the same of the samples */

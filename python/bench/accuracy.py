@@ -1,5 +1,5 @@
 # SPDX-License-Identifier: Apache-2.0
-"""How far the orbit model lies from exact and from precise state vectors, and whether the way forth and back closes.
+"""How far the orbit model lies from exact and from precise state vectors, and whether the way back closes.
 
 Usage: accuracy.py
 """

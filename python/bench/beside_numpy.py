@@ -36,7 +36,8 @@ class Curve:
 def earth_fixed(latitude, longitude):
     phi, lam = np.radians(latitude), np.radians(longitude)
     across = A_M**2 / np.sqrt((A_M * np.cos(phi)) ** 2 + (B_M * np.sin(phi)) ** 2)
-    return np.stack([across * np.cos(phi) * np.cos(lam), across * np.cos(phi) * np.sin(lam), (B_M / A_M) ** 2 * across * np.sin(phi)])
+    level = across * np.cos(phi)
+    return np.stack([level * np.cos(lam), level * np.sin(lam), (B_M / A_M) ** 2 * across * np.sin(phi)])
 
 
 def to_radar(curve, latitude, longitude):
@@ -63,7 +64,8 @@ def main():
     package, numpy_alone = (
         seconds(doing, 5) for doing in (lambda: orbit.to_radar(*ground[:2]), lambda: to_radar(curve, *ground[:2]))
     )
-    print(f"to_radar, {POINTS} points: {package:.3f} s; numpy: {numpy_alone:.3f} s, {numpy_alone / package:.1f} times as long;"
+    print(f"to_radar, {POINTS} points: {package:.3f} s; numpy: {numpy_alone:.3f} s,"
+          f" {numpy_alone / package:.1f} times as long;"
           f" at most {off[0]:.1g} s of azimuth and {off[1]:.1g} s of range apart")
 
 

@@ -1,5 +1,5 @@
 # SPDX-License-Identifier: Apache-2.0
-"""Calls of the bindings that tell a wrong argument without their own signatures, which are none of the package's."""
+"""Calls of the bindings that tell a wrong argument without their signatures, which are none of the package's."""
 
 from __future__ import annotations
 

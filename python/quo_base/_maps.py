@@ -160,12 +160,14 @@ def _geoid_of(path: Any, crs: Any, heights: Optional[str]) -> Optional[str]:
     whole = CRS.from_wkt(crs.to_wkt())
     if not whole.is_compound and len(whole.axis_info) == 3:
         if heights not in (None, "ellipsoid") or whole.axis_info[2].unit_name != "metre":
-            raise ValueError(f"{path}: its heights are above the ellipsoid of {whole.name}, in {whole.axis_info[2].unit_name}")
+            unit = whole.axis_info[2].unit_name
+            raise ValueError(f"{path}: its heights are above the ellipsoid of {whole.name}, in {unit}")
         return None
     vertical = [part.to_authority() for part in whole.sub_crs_list if part.is_vertical]
     named = "+".join(["EPSG:4326", vertical[0][1]]) if vertical and vertical[0] else None
     if heights is None and not vertical:
-        raise ValueError(f"{path} does not name what its heights stand on: heights={' or '.join(map(repr, _HEIGHTS))}")
+        known = " or ".join(map(repr, _HEIGHTS))
+        raise ValueError(f"{path} does not name what its heights stand on: heights={known}")
     if heights is None and named is None:
         raise ValueError(f"{path}: its heights stand on {whole.sub_crs_list[-1].name}, which is not known here")
     if heights is not None and vertical and named != _HEIGHTS[heights]:
@@ -199,14 +201,17 @@ class MapGrid(NamedTuple):
             step = _spacing_of(terrain, wanted) if spacing is None else float(spacing)
             if step > _COARSEST * max(np.ptp(x), np.ptp(y)):
                 raise ValueError(f"a spacing of {step:g} is far coarser than the image is wide")
-            transform = (step, 0.0, step * np.floor(np.min(x) / step), 0.0, -step, step * np.ceil(np.max(y) / step))
+            left, top = step * np.floor(np.min(x) / step), step * np.ceil(np.max(y) / step)
+            transform = (step, 0.0, left, 0.0, -step, top)
             finest, pixel_m = _FINEST * _finest_m(product), _pixel_m(wanted, transform, (0, 0))
             if not pixel_m > finest:
                 raise ValueError(f"a spacing of {step:g}, {pixel_m:.2g} m, is far finer than the image's pixels")
         return cls._covering(wanted, transform, x, y, terrain if crs is None and spacing is None else None)
 
     @classmethod
-    def _covering(cls, crs: str, transform: Any, x: np.ndarray, y: np.ndarray, limit: Optional[Terrain]) -> MapGrid:
+    def _covering(
+        cls, crs: str, transform: Any, x: np.ndarray, y: np.ndarray, limit: Optional[Terrain]
+    ) -> MapGrid:
         a, _, c, _, e, f = transform
         columns, rows = (np.sort([np.min(v), np.max(v)]) for v in ((x - c) / a, (y - f) / e))
         first = np.floor([rows[0], columns[0]]).astype(int)
@@ -217,7 +222,8 @@ class MapGrid(NamedTuple):
         if (last <= first).any():
             raise ValueError("the elevation model and the image have no place in common")
         moved = (a, 0.0, c + a * first[1], 0.0, e, f + e * first[0])
-        return cls(crs, moved, (int(last[0] - first[0]), int(last[1] - first[1])), _pixel_m(crs, moved, last - first))
+        size = last - first
+        return cls(crs, moved, (int(size[0]), int(size[1])), _pixel_m(crs, moved, size))
 
     def axes(self) -> tuple[np.ndarray, np.ndarray]:
         """Coordinates of the pixels' centres: x of the columns, y of the rows."""
@@ -282,7 +288,8 @@ def _pixel_m(crs: str, transform: Any, shape: Any) -> float:
     """Length of the shorter side of a pixel in the middle of a map, m."""
     a, _, c, _, e, f = transform
     x, y = c + a * shape[1] / 2, f + e * shape[0] / 2
-    longitude, latitude = _transformer(crs, "EPSG:4326").transform(np.array([x, x + a, x]), np.array([y, y, y + e]))
+    places = np.array([x, x + a, x]), np.array([y, y, y + e])
+    longitude, latitude = _transformer(crs, "EPSG:4326").transform(*places)
     corner, east, north = earth_fixed(latitude, longitude, np.zeros(3))
     return float(min(np.linalg.norm(east - corner), np.linalg.norm(north - corner)))
 
@@ -296,7 +303,7 @@ def _finest_m(product: Any) -> float:
     return float(min(np.linalg.norm(below - corner), np.linalg.norm(beside - corner)))
 
 
-# --- Samples at places between them -------------------------------------------------------------------------------
+# --- Samples at places between them ------------------------------------------------------------------------------
 
 
 def _window(row: Any, column: Any, shape: tuple[int, int], margin: int) -> Optional[tuple[int, int, int, int]]:
@@ -364,7 +371,7 @@ def resample(raster: Any, line: np.ndarray, sample: np.ndarray, how: str) -> np.
     return made.astype(np.float32)
 
 
-# --- Terrain ------------------------------------------------------------------------------------------------------
+# --- Terrain -----------------------------------------------------------------------------------------------------
 
 
 def earth_fixed(latitude: np.ndarray, longitude: np.ndarray, height: np.ndarray) -> np.ndarray:
@@ -418,8 +425,8 @@ def layover_and_shadow(
 
     heights(rows, columns): terrain with so many more rows and columns on each side; here: its middle; tangent: of
     the angle of incidence; steps: as of map_steps(); relief: of all terrain. The rays are taken as parallel over
-    the few kilometres in question, and the ground as flat between places. What is asked of a place hangs on its own
-    surroundings alone, whatever part of the map is made.
+    the few kilometres in question, and the ground as flat between places. What is asked of a place hangs on its
+    own surroundings alone, whatever part of the map is made.
     """
     known = np.isfinite(here) & np.isfinite(tangent) & np.isfinite(steps[0]) & np.isfinite(steps[1])
     mask = np.where(known, 0, UNKNOWN).astype(np.uint8)

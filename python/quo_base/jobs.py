@@ -20,7 +20,8 @@ __all__ = ["Job", "Outcome", "run"]
 
 class Job(NamedTuple):
     """`function(path, *arguments)` makes an output, a file or a folder, at the path that it is given, which lies
-    beside `output`; it then takes that name. Function and arguments travel to other processes: paths, not arrays."""
+    beside `output`; it then takes that name. Function and arguments travel to other processes: paths, not arrays.
+    """
 
     output: str
     function: Callable[..., Any]
@@ -38,8 +39,8 @@ class Outcome(NamedTuple):
     """Why it failed, else empty."""
 
 
-# --- Names of what is begun: OUTPUT.part- and 32 digits, for host (8), process (8) and run (8) of the caller and for
-# the attempt (8), so that a run knows its own and those whose caller is gone.
+# --- Names of what is begun: OUTPUT.part- and 32 digits, for host (8), process (8) and run (8) of the caller and
+# for the attempt (8), so that a run knows its own and those whose caller is gone.
 
 _PART = re.compile(r"(.+)\.part-([0-9a-f]{24})[0-9a-f]{8}", re.DOTALL)
 
@@ -153,14 +154,16 @@ def run(
 ) -> list[Outcome]:
     """Makes outputs in parallel: on a distributed.Client, or on threads of this process.
 
-    Outputs that are there are skipped, so that running again does what is left. Each output appears whole or not at
-    all: jobs write beside it, under a name of their own, and what a killed worker has left there goes at the end, as
-    does what runs left whose process on this host is gone. A job that raises is tried again, `tries` times in all.
-    progress: called with the jobs done, all jobs, those that failed, and when it began (time.monotonic()); None for
-    none; what it raises ends the run once the jobs that were begun are done. Outcomes have the order of the jobs.
+    Outputs that are there are skipped, so that running again does what is left. Each output appears whole or not
+    at all: jobs write beside it, under a name of their own, and what a killed worker has left there goes at the
+    end, as does what runs left whose process on this host is gone. A job that raises is tried again, `tries` times
+    in all. progress: called with the jobs done, all jobs, those that failed, and when it began (time.monotonic());
+    None for none; what it raises ends the run once the jobs that were begun are done. Outcomes have the order of
+    the jobs.
     """
     wanted = list(jobs)
-    absolute = [job._replace(output=os.path.abspath(job.output)) for job in wanted]  # workers have folders of their own
+    # Workers have folders of their own.
+    absolute = [job._replace(output=os.path.abspath(job.output)) for job in wanted]
     outputs = {job.output for job in absolute}
     if len(outputs) != len(wanted):
         raise ValueError("two jobs have one output")

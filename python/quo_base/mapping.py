@@ -40,9 +40,9 @@ class _Job(NamedTuple):
     resampling: str
     quantities: tuple[str, ...]
     relief: float
-    """Of all the ground that can hide or overlay a place of the map, so that tiles see what the whole map sees, m."""
+    """Of all the ground that can hide or overlay a place of the map, so that tiles see what the map sees, m."""
     files: tuple[tuple[int, int], ...]
-    """Sizes and times of header, raster and model: maps of files that have changed have other names in a cluster."""
+    """Sizes and times of header, raster and model: maps of changed files have other names in a cluster."""
 
     def tile(self, row: int, column: int, rows: int, columns: int) -> dict[str, np.ndarray]:
         """Those quantities on rows x columns of the map from a place on."""
@@ -147,14 +147,15 @@ def geocode(
 ) -> Any:
     """The product's image as a map: an xarray.Dataset with one variable for each quantity.
 
-    product: as its file has it; one with changes that are not saved is refused. dem: elevation model, any file that
-    rasterio reads, in metres once its scale is applied. heights: what its heights stand on, "ellipsoid" (WGS84), "egm96" or "egm2008"; unless told, what
-    the file names, and one that names nothing is refused. Geoid heights are converted by pyproj, or refused where
-    its grids are missing. crs and spacing (in units of crs): the map's reference system and pixels; unless given
-    those of the elevation model. What is far finer than the image's pixels or coarser than all of it is refused.
-    The map covers the model as far as the image may reach. resampling: "nearest", "bilinear" or "sinc" (eight
-    samples each way). quantities: see QUANTITIES. chunks: pixels of a tile's side, or "auto"; then the variables are
-    dask arrays of tiles that are made when they are asked for, on any scheduler. Not-a-number where there is no image.
+    product: as its file has it; one with changes that are not saved is refused. dem: elevation model, any file
+    that rasterio reads, in metres once its scale is applied. heights: what its heights stand on, "ellipsoid"
+    (WGS84), "egm96" or "egm2008"; unless told, what the file names, and one that names nothing is refused. Geoid
+    heights are converted by pyproj, or refused where its grids are missing. crs and spacing (in units of crs): the
+    map's reference system and pixels; unless given those of the elevation model. What is far finer than the
+    image's pixels or coarser than all of it is refused. The map covers the model as far as the image may reach.
+    resampling: "nearest", "bilinear" or "sinc" (eight samples each way). quantities: see QUANTITIES. chunks:
+    pixels of a tile's side, or "auto"; then the variables are dask arrays of tiles that are made when they are
+    asked for, on any scheduler. Not-a-number where there is no image.
 
     Amplitudes of complex images are interpolated, not the samples: their phase turns too fast for a neighbour's.
     """
@@ -171,7 +172,9 @@ def geocode(
     names = (absolute(held.path), absolute(held.raster.path))
     files = tuple(map(_stamp, (*names, terrain.path)))
     job = _Job(*names, terrain, grid, resampling, tuple(quantities), relief, files)
-    return _dataset(job, _eager(job) if chunks is None else _lazy(job, chunks if isinstance(chunks, int) else _TILE))
+    if chunks is None:
+        return _dataset(job, _eager(job))
+    return _dataset(job, _lazy(job, chunks if isinstance(chunks, int) else _TILE))
 
 
 def _stamp(name: str) -> tuple[int, int]:
@@ -247,7 +250,8 @@ def _lazy(job: _Job, size: int) -> dict[str, Any]:
     token = tokenize(job, size)
     places = [(i, j) for i in range(len(rows)) for j in range(len(columns))]
     tiles = {
-        (f"tile-{token}", i, j): (job.tile, rows[i][0], columns[j][0], rows[i][1], columns[j][1]) for i, j in places
+        (f"tile-{token}", i, j): (job.tile, rows[i][0], columns[j][0], rows[i][1], columns[j][1])
+        for i, j in places
     }
     chunks = tuple(tuple(count for _, count in spans) for spans in (rows, columns))
     made = {}

@@ -274,7 +274,9 @@ class _Covered:
         return int(sizes[~held].sum())
 
 
-def _joined(one: tuple[int, int, int, int], other: tuple[int, int, int, int]) -> Optional[tuple[int, int, int, int]]:
+def _joined(
+    one: tuple[int, int, int, int], other: tuple[int, int, int, int]
+) -> Optional[tuple[int, int, int, int]]:
     """Two rectangles as one, where the other goes on where the one ends."""
     if one[:2] == other[:2] and one[2] <= other[2] <= one[3]:
         return (*one[:2], one[2], max(one[3], other[3]))

@@ -24,8 +24,9 @@ _NANOSECOND = np.timedelta64(1, "ns")
 def to_seconds(times: Any) -> Any:
     """Seconds since 1985 of numbers (as they are), datetime64, datetime or texts, in the shape of the input.
 
-    Texts are ISO 8601 ("2022-01-04T17:05:58.25", "2022-01-04") or the headers' form ("04-JAN-2022 17:05:58.250000"). Not-a-time
-    and what is masked become not-a-number. Of a time in this century a float64 keeps quarters of a microsecond.
+    Texts are ISO 8601 ("2022-01-04T17:05:58.25", "2022-01-04") or the headers' form ("04-JAN-2022
+    17:05:58.250000"). Not-a-time and what is masked become not-a-number. Of a time in this century a float64 keeps
+    quarters of a microsecond.
     """
     array = np.asarray(times)
     if array.dtype.kind not in "UOM":

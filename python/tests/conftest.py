@@ -41,8 +41,8 @@ def write_sparse_tiff(path, lines, samples, complex_samples):
     """Integers of 16 bits, in pairs or alone, in one strip, all zero and none of them on the disk."""
     size, kind = lines * samples * (4 if complex_samples else 2), 5 if complex_samples else 1
     bits = 32 if complex_samples else 16
-    tags = [(256, samples), (257, lines), (258, bits), (259, 1), (262, 1), (273, 8), (277, 1), (278, lines), (279, size)]
-    tags.append((339, kind))
+    tags = [(256, samples), (257, lines), (258, bits), (259, 1), (262, 1), (273, 8), (277, 1)]
+    tags += [(278, lines), (279, size), (339, kind)]
     with open(path, "wb") as file:
         file.write(struct.pack("<2sHI", b"II", 42, 8 + size))
         file.seek(8 + size)
@@ -51,7 +51,7 @@ def write_sparse_tiff(path, lines, samples, complex_samples):
 
 
 def copy_of_safe(name, folder, lines, samples, stated_samples):
-    """A bundled product in a folder, with a measurement of fewer samples than its annotation states, and the text of it."""
+    """A bundled product in a folder, with a measurement of fewer samples than it states, and the annotation."""
     shutil.copytree(DATA / "sentinel1" / name, folder / name)
     annotation = next((folder / name / "annotation").iterdir())
     text = annotation.read_text()

@@ -29,12 +29,14 @@ def stripes(latitude, longitude):
 
 @pytest.fixture(scope="module")
 def product(tmp_path_factory):
-    """A part of a real scene whose amplitudes are large near half minutes of latitude and near some of longitude."""
+    """A part of a real scene, its amplitudes large near half minutes of latitude and near some of longitude."""
     path = str(tmp_path_factory.mktemp("map") / "image")
     scene = Product(DATA / "scenes" / (SCENES[0] + ".xml"))
     made = scene.clone()
-    region = {"SlowStartTime": 1167930362.0, "SlowTimeDelta": 2.0555e-3, "Lines": LINES, "SlowTimeLength": 2.0555e-3 * LINES}
-    region |= {"FastStartTime": 0.0055, "FastTimeDelta": 1.5541e-8, "Samples": SAMPLES, "FastTimeLength": 1.5541e-8 * SAMPLES}
+    slow_s, fast_s = 2.0555e-3, 1.5541e-8
+    region = {"SlowStartTime": 1167930362.0, "SlowTimeDelta": slow_s, "SlowTimeLength": slow_s * LINES}
+    region |= {"FastStartTime": 0.0055, "FastTimeDelta": fast_s, "FastTimeLength": fast_s * SAMPLES}
+    region |= {"Lines": LINES, "Samples": SAMPLES}
     made.add("ROI", **region)
     line, sample = np.meshgrid(np.arange(LINES), np.arange(SAMPLES), indexing="ij")
     seen = made.orbit.to_ground(1167930362.0 + 2.0555e-3 * line, 0.0055 + 1.5541e-8 * sample)
@@ -93,7 +95,7 @@ def test_a_ridge_hides_and_overlays_what_its_geometry_says(product, tmp_path):
     x, y, z = product.orbit.velocity(times.azimuth_time)
     phi, lam = np.radians(middle[:2])
     to_north = np.cos(phi) * z - np.sin(phi) * (np.cos(lam) * x + np.sin(lam) * y)
-    across = np.hypot(to_north, np.cos(lam) * y - np.sin(lam) * x) / to_north  # the ridge runs north, the track not quite
+    across = np.hypot(to_north, np.cos(lam) * y - np.sin(lam) * x) / to_north  # the ridge runs north
     assert np.sum(row & 2 > 0) * 10 == pytest.approx(300 * np.tan(angle) * across, abs=30)
     assert np.sum(row & 1 > 0) * 10 == pytest.approx(300 / np.tan(angle) * across, abs=60)
 
@@ -109,7 +111,9 @@ def test_heights_of_a_geoid_are_converted_or_refused_and_never_mixed(product, fl
     with pytest.raises(ValueError, match="no place in common"):
         far = write_model(tmp_path / "far.tif", np.zeros((9, 9)), (150.0, 10.0), 1e-3)
         geocode(product, far, heights="ellipsoid")
-    for wrong in ({"spacing": 1e-9}, {"spacing": 1e9}, {"crs": "EPSG:4978"}, {"resampling": "cubic"}, {"quantities": []}, {"quantities": ["height", "slope"]}, {"heights": "sea"}, {"spacing": -1.0}, {"chunks": 0}):
+    refused = {"spacing": (1e-9, 1e9, -1.0), "crs": ("EPSG:4978",), "resampling": ("cubic",), "heights": ("sea",)}
+    refused |= {"quantities": ([], ["height", "slope"]), "chunks": (0,)}
+    for wrong in ({name: value} for name, values in refused.items() for value in values):
         with pytest.raises(ValueError):
             geocode(product, flat, **{"heights": "ellipsoid", **wrong})
     with pytest.MonkeyPatch.context() as absent, pytest.raises(ModuleNotFoundError, match="python3-pyproj"):
@@ -131,7 +135,8 @@ def test_heights_are_what_their_file_means(product, flat, tmp_path):
     made = geocode(product, flat, heights="ellipsoid", quantities=["height", "mask"])
     assert np.isnan(made.height[30, 200]) and made["mask"][30, 200] == 4 and not made["mask"][:, :100].any()
     np.testing.assert_allclose(made.height[:, :100], 105.0, rtol=1e-12)
-    solid = write_model(tmp_path / "solid.tif", np.zeros((60, 400)), rasterio.open(flat).transform[2:6:3], 1e-4, "EPSG:4979")
+    corner = rasterio.open(flat).transform[2:6:3]
+    solid = write_model(tmp_path / "solid.tif", np.zeros((60, 400)), corner, 1e-4, "EPSG:4979")
     assert not geocode(product, solid, quantities=["height"]).height.any()
     with pytest.raises(ValueError, match="ellipsoid"):
         geocode(product, solid, heights="egm96")
@@ -149,7 +154,8 @@ def test_a_map_goes_on_beyond_the_antimeridian(product, flat, tmp_path, width, t
     delta = 180.0 - west - 200.5 * a
     turned, c, s = product.clone(), np.cos(np.radians(delta)), np.sin(np.radians(delta))
     vectors, matrix = product.orbit, np.array([[c, -s, 0], [s, c, 0], [0, 0, 1]])
-    turned.orbit = quo_base.Orbit(vectors.first_time, vectors.spacing, vectors.positions @ matrix.T, vectors.velocities @ matrix.T)
+    moved = vectors.positions @ matrix.T, vectors.velocities @ matrix.T
+    turned.orbit = quo_base.Orbit(vectors.first_time, vectors.spacing, *moved)
     turned.save(tmp_path / "turned.hdr", exact=True)
     turned = Product(tmp_path / "turned.hdr", raster=product.path[:-4])
     if width == 400:
@@ -178,7 +184,8 @@ def check_real_terrain(product):
     seen = product.orbit.to_radar(latitude, longitude, height)
     there = product.grid.pixels(*seen[:2])
     assert made.height.shape == (120, 120) and np.ptp(height) > 20
-    for name, expected, most in (("height", height, 1e-4), ("line", there.line, 1e-3), ("sample", there.sample, 1e-3)):
+    expectations = (("height", height, 1e-4), ("line", there.line, 1e-3), ("sample", there.sample, 1e-3))
+    for name, expected, most in expectations:
         np.testing.assert_allclose(made[name].values[row, column], expected, rtol=0, atol=most)
     line, sample, latitude, longitude, height, incidence = 8020, 22202, 42.00620382, 12.49345628, 93.9934, 44.0716
     here = made.interp(x=longitude, y=latitude)
@@ -188,7 +195,7 @@ def check_real_terrain(product):
 
 
 def test_tie_points_of_a_real_ground_range_image_lie_on_their_pixels(tmp_path):
-    """On slopes that go through each tie point's height: what its producer states, from the whole chain of the map."""
+    """On slopes that go through each tie point's height: what its producer states, from the whole chain."""
     name = "S1B_IW_GRDH_1SDV_20211223T051122_20211223T051147_030148_039993_5371.SAFE"
     folder, annotation = copy_of_safe(name, tmp_path, 16705, 30, 26102)
     product = sentinel1.import_product(folder, tmp_path / "image").product
@@ -228,7 +235,8 @@ def test_files_and_clusters_that_go_are_told(product, flat, tmp_path, monkeypatc
     there = geocode(changed, "flat.tif", heights="ellipsoid", chunks="auto").image  # names without a folder
     assert there.data.npartitions == 1 and there.data.name != tiles.image.data.name
     monkeypatch.chdir("/")
-    np.testing.assert_array_equal(there.compute(scheduler="synchronous"), tiles.image.compute(scheduler="synchronous"))
+    one, other = (each.compute(scheduler="synchronous") for each in (there, tiles.image))
+    np.testing.assert_array_equal(one, other)
     monkeypatch.chdir(tmp_path)
     os.utime(flat, (1, 1))  # a model that has changed makes other tiles
     assert geocode(changed, flat, heights="ellipsoid", chunks=64).image.data.name != tiles.image.data.name
@@ -298,7 +306,8 @@ def test_only_what_this_run_or_a_dead_one_has_begun_is_swept(tmp_path):
     dead = subprocess.Popen(["true"])
     dead.wait()
     out = str(tmp_path / "out")
-    stay = [".part-1", ".part-" + "g" * 32, f".part-{host}{mine}{0:016x}", f".part-{'0' * 8}{dead.pid:08x}{0:016x}"]
+    stay = [".part-1", ".part-" + "g" * 32]
+    stay += [f".part-{host}{mine}{0:016x}", f".part-{'0' * 8}{dead.pid:08x}{0:016x}"]
     output_too = f".part-{host}{dead.pid:08x}{1:016x}"
     for tail in (*stay, output_too, f".part-{host}{dead.pid:08x}{0:016x}"):
         _write(out + tail, "")
@@ -330,7 +339,8 @@ def test_a_killed_worker_leaves_nothing_half(tmp_path, product, flat):
             assert all(outcome.state != "failed" for outcome in run(jobs, client, progress=None))
             tiles = geocode(product, flat, heights="ellipsoid", chunks=100).image
             mark = str(tmp_path / "again")
-            tiles = tiles.data.map_blocks(_kill_once_within, mark, dtype=tiles.dtype, meta=np.empty((0, 0), "f4")).compute()
+            meta = np.empty((0, 0), "f4")
+            tiles = tiles.data.map_blocks(_kill_once_within, mark, dtype=tiles.dtype, meta=meta).compute()
     assert os.path.exists(mark) and (tmp_path / "killed").read_text() == "whole"
     assert not [name for name in os.listdir(tmp_path) if ".part-" in name]
     np.testing.assert_array_equal(tiles, whole)

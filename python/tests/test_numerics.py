@@ -61,6 +61,10 @@ def test_wrong_types_are_told_in_the_words_of_the_package(doing):
     assert "_core" not in str(caught.value) and "self:" not in str(caught.value)
 
 
+def region_at(range_s):
+    return Region.of_axes((range_s, 1e-8, 9), (1e9, 0.002, 9))
+
+
 @pytest.mark.parametrize(
     "refused, doing",
     [
@@ -69,8 +73,8 @@ def test_wrong_types_are_told_in_the_words_of_the_package(doing):
         (ValueError, lambda: signal.irfft(np.zeros(4), 9)),
         (ValueError, lambda: signal.irfft(np.zeros(1), 0)),
         (ValueError, lambda: signal.fast_length(2**31 - 1)),
-        (ValueError, lambda: Region.of_axes((0.005, 1e-8, 9), (1e9, 0.002, 9)).samples([np.nan])),
-        (ValueError, lambda: Region.of_axes((0.005, 1e-8, 9), (1e9, 0.002, 9)) & Region.of_axes((0.006, 1e-8, 9), (1e9, 0.002, 9))),
+        (ValueError, lambda: region_at(0.005).samples([np.nan])),
+        (ValueError, lambda: region_at(0.005) & region_at(0.006)),
         (ValueError, lambda: ParameterFile("x").__setitem__(("A", "B"), "one\n[C]")),
         (ValueError, lambda: ParameterFile("x").__setitem__(("A", "B\0"), 1)),
         (ValueError, lambda: signal.resize(np.zeros((4, 4)), (2, 8))),

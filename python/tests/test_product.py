@@ -46,7 +46,8 @@ def test_the_grid_is_that_of_the_sections_as_they_are(scene_file, tmp_path):
     before = product.grid.times(0, 0)
     product.ROI.SlowStartTime += 0.25
     assert product.grid.times(0, 0).azimuth_time == before.azimuth_time + 0.25
-    product.add("ImageGrid", Epoch_s=1.1e9, FirstLine_s=0.5, LineStep_s=0.002, FirstSample_s=0.005, SampleStep_s=1e-8)
+    product.add("ImageGrid", Epoch_s=1.1e9, FirstLine_s=0.5, LineStep_s=0.002)
+    product.ImageGrid.update(FirstSample_s=0.005, SampleStep_s=1e-8)
     assert product.grid.times(0, 0)[:2] == (1.1e9 + 0.5, 0.005)
     product.save(tmp_path / "broken.hdr")  # a grid that is none is not the region's
     text = (tmp_path / "broken.hdr").read_text()

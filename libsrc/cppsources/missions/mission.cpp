@@ -61,6 +61,7 @@ quo_tie_points TiePoints::compare(const ImageGrid_Obj& grid, const GeneralSAROrb
         places.add(norm(Vec3{x[i], y[i], z[i]} - from_geodetic({latitude[i], longitude[i], height_m[i]})));
     }
     return {static_cast<std::int32_t>(lines.count()),
+            static_cast<std::int32_t>(n),
             lines.rms(),
             lines.largest(),
             columns.rms(),

@@ -487,6 +487,7 @@ void describe_sentinel1(const MissionFiles& files, const std::string& orbit_file
     set_data_set(a, files, header);
     set_grid(a, product.grid);
     TiePoints ties = stated_ties(a);
+    const auto stated = static_cast<std::int32_t>(ties.count());
     if (ties.find_times(header.orbit)) {
         find_delay(ties, product.grid);
         ties.drop_wrong(product.grid, header.orbit, files.annotation);
@@ -499,6 +500,7 @@ void describe_sentinel1(const MissionFiles& files, const std::string& orbit_file
         set_orbit(header, vectors, orbit_file);
     }
     if (ties.find_times(header.orbit)) product.ties = ties.compare(product.grid, header.orbit);
+    product.ties.stated = stated;
     set_region(a, product.grid, header);
     set_polynomials(a, product.grid, header);
     set_attitude(a, product.grid, header);

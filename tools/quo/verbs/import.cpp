@@ -35,12 +35,19 @@ struct Watch {
     std::optional<Interrupted> interrupted;
 };
 
+std::string tie_points_text(const quo_tie_points& ties) {
+    const std::string points = " tie points", compared = std::to_string(ties.count);
+    if (ties.count == ties.stated) return compared + points;
+    return compared + " of " + std::to_string(ties.stated) + points +
+           " (the others in no burst, unseen by the orbit, or more than a pixel off)";
+}
+
 void show(const ImportOptions& options, const quo_import_result& result) {
     std::string text = shown(options.raster) + ": " + std::to_string(result.lines) + " lines of " +
                        std::to_string(result.samples) + " samples" + (result.linked != 0 ? ", linked" : "") + "\n";
     const quo_tie_points& ties = result.ties;
     if (ties.count > 0)
-        text += std::to_string(ties.count) + " tie points: lines rms " + fixed(ties.rms_line, 5) + " max " +
+        text += tie_points_text(ties) + ": lines rms " + fixed(ties.rms_line, 5) + " max " +
                 fixed(ties.most_line, 5) + ", samples rms " + fixed(ties.rms_sample, 5) + " max " +
                 fixed(ties.most_sample, 5) + ", ground rms " + fixed(ties.rms_ground_m, 4) + " m max " +
                 fixed(ties.most_ground_m, 4) + " m\n";
