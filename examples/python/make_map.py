@@ -1,8 +1,8 @@
 # SPDX-License-Identifier: Apache-2.0
 """A picture of an image on the map, and of the surroundings of known places, which should be bright in the middle.
 
-The map is in the UTM zone of the first place. The elevation model's heights are above the ellipsoid. Places are a list with
-the columns name, latitude_deg, longitude_deg and height_m.
+The map is in the UTM zone of the first place. The elevation model's heights are above the ellipsoid. Places are a
+list with the columns name, latitude_deg, longitude_deg and height_m.
 
 Usage: make_map.py HEADER DEM PLACES.csv PICTURE.png
 """

@@ -41,7 +41,9 @@ def draw_a_map_of_islands(cut_map, folder):
     import make_map
 
     rows = ["name,latitude_deg,longitude_deg,height_m"]
-    rows += [f"{i}{j},{cut_map.y.values[i]},{cut_map.x.values[j]},30" for i in (300, 320, 340) for j in (430, 450, 470)]
+    rows += [
+        f"{i}{j},{cut_map.y.values[i]},{cut_map.x.values[j]},30" for i in (300, 320, 340) for j in (430, 450, 470)
+    ]
     (folder / "places.csv").write_text("\n".join(rows))
     elevation_model.main("places.csv", "islands.tif")
     make_map.main("cut.hdr", "islands.tif", "places.csv", "islands.png")
@@ -64,7 +66,8 @@ def test_the_examples_of_the_page_run(scene_file, tmp_path, monkeypatch, capsys)
         exec(block, {})
     assert np.array_equal(names["block"], samples[100:150, ::2]) and names["seen"].status.sum() == 0
     assert names["cut_map"]["image"].shape == (644, 900) and [each.state for each in names["outcomes"]] == ["made"]
-    assert names["power"].shape == (LINES,) and names["fit"].rank == 3 and (tmp_path / "maps.png").stat().st_size > 1e4
+    assert names["power"].shape == (LINES,) and names["fit"].rank == 3
+    assert (tmp_path / "maps.png").stat().st_size > 1e4
     monkeypatch.syspath_prepend(ROOT / "examples" / "python")
     import geolocate
     import line_profile
@@ -74,7 +77,8 @@ def test_the_examples_of_the_page_run(scene_file, tmp_path, monkeypatch, capsys)
     geolocate.main("cut.hdr")
     line_profile.main("cut.hdr", "64")
     told = capsys.readouterr().out
-    assert told.count("incidence") == 5 and f"{LINES} lines, mean power {np.mean(np.abs(samples) ** 2):.0f}"[:-1] in told
+    assert told.count("incidence") == 5
+    assert f"{LINES} lines, mean power {np.mean(np.abs(samples) ** 2):.0f}"[:-1] in told
     maps_on_workers.make_map("map.tif", "cut.hdr", "dem.tif")
     monkeypatch.setattr("sys.argv", ["", "dem.tif", ".", "cut.hdr", "--scheduler"])
     with distributed.LocalCluster(n_workers=1, processes=False, dashboard_address=None) as cluster:
