@@ -41,19 +41,15 @@ struct LaneFft {
     std::ptrdiff_t pitch = 0;                      ///< slots from one transform of step 2 to the next
     std::ptrdiff_t tile = 0, stage = 0, work = 0;  ///< floats of room
 
-    [[nodiscard]] int length() const { return first.length * second.length; }
     [[nodiscard]] bool two_steps() const { return second.passes > 0; }
-    [[nodiscard]] std::ptrdiff_t room() const { return tile + stage + work; }
 };
 
 /** A transform along a row: its lanes are neighbours in step 1, results that are neighbours in step 2. */
 struct RowFft {
-    LaneFft first, second;
-    const float* turns = nullptr;    ///< of step 1, a slot for each result of each pack of lanes
-    const FftRoot* packs = nullptr;  ///< if any, the turns are those of the first pack, and these are by what
-                                     ///< the results of each pack are turned beyond
-    std::ptrdiff_t pitch = 0;        ///< floats from one result of step 1 to the next
-    std::ptrdiff_t tile = 0, lanes = 0;
+    ShortFft first, second;
+    const float* turns = nullptr;  ///< of step 1, a slot for each result of each pack of lanes
+    std::ptrdiff_t pitch = 0;      ///< floats from one result of step 1 to the next
+    std::ptrdiff_t tile = 0;       ///< floats
 };
 
 /** Columns of images: from one sample to the next, and how many columns. */

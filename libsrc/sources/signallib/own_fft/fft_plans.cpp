@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <limits>
 #include <map>
+#include <new>
 #include <numbers>
 #include <utility>
 
@@ -32,10 +33,6 @@ constexpr double kUnaligned = 4.0;
 constexpr double kPerSample = 0.1;
 /** Lengths up to this one are transformed in one step, whose buffers the first cache holds. */
 constexpr int kOneStep = 128;
-/** The same of the lanes along a row, one pack of them at a time. */
-constexpr int kOneRowStep = 2048;
-/** Rows whose turns, kept whole, would come from memory. */
-constexpr int kLongRow = 1 << 17;
 /** Short rows up to this length, eight at a time, leave room in the first cache. */
 constexpr int kCachedShortRow = 320;
 
@@ -78,16 +75,12 @@ Split split(PassChoice& passes, int length, int lanes) {
     Split best;
     const bool rows = lanes > 1;
     const auto first_cost = [&](int first, int second) {
-        const bool moved = rows && first > kOneRowStep / lanes, unaligned = rows && second % 8 != 0;
-        return passes.of(first).cost + kPerSample * first + (moved ? kMoved : 0.0) +
-               (unaligned ? kUnaligned : 0.0);
+        return passes.of(first).cost + kPerSample * first + (rows && second % 8 != 0 ? kUnaligned : 0.0);
     };
+    // Lanes and slots are exchanged on the way into a single pass, otherwise through the buffer before the next.
     const auto second_cost = [&](int second) {
         const Passes& own = passes.of(second);
-        // Lanes and slots are exchanged on the way into a single pass, otherwise through the buffer before the
-        // next.
-        const int moves = rows ? (own.radices.size() > 1 ? 1 : 0) + (second > kOneRowStep / lanes ? 1 : 0) : 0;
-        return own.cost + kPerSample * second + kMoved * moves;
+        return own.cost + kPerSample * second + (rows && own.radices.size() > 1 ? kMoved : 0.0);
     };
     const auto filled = [&](int count) { return static_cast<double>(packs_of(count, lanes)) * lanes / count; };
     for (int second = lanes; second <= length / lanes && second / 64 <= length / second; ++second) {
@@ -201,14 +194,13 @@ FftTables::FftTables(const FftKind& kind) : kind_{kind}, kernels_{fft_kernels(ki
     if (kind.way == FftWay::Rows)
         row_ = along_row();
     else
-        lanes_ = down_lanes(kind.length, kStripPacks);
+        lanes_ = down_lanes(kind.length);
 }
 
 std::size_t FftTables::room() const noexcept {
-    const std::ptrdiff_t floats = kind_.way == FftWay::Rows
-                                      ? row_.tile + row_.lanes + std::max(row_.first.room(), row_.second.room())
-                                      : lanes_.room();
-    return static_cast<std::size_t>(floats);
+    const std::ptrdiff_t work = 4 * std::ptrdiff_t{kind_.lanes} * std::max(row_.first.length, row_.second.length);
+    return static_cast<std::size_t>(kind_.way == FftWay::Rows ? row_.tile + work
+                                                              : lanes_.tile + lanes_.stage + lanes_.work);
 }
 
 void FftTables::run(const float* in, float* out, std::ptrdiff_t pitch, int count, float* room) const noexcept {
@@ -245,11 +237,10 @@ ShortFft FftTables::take_apart(int length) {
     return fft;
 }
 
-LaneFft FftTables::down_lanes(int length, int packs) {
+LaneFft FftTables::down_lanes(int length) {
     LaneFft fft;
     const std::ptrdiff_t slot = 2 * std::ptrdiff_t{kind_.lanes};
-    const int most = kind_.way == FftWay::Rows ? kOneRowStep / kind_.lanes : kOneStep;
-    if (length <= most || kind_.way == FftWay::ShortRows) {
+    if (length <= kOneStep || kind_.way == FftWay::ShortRows) {
         fft.first = take_apart(length);
         fft.stage = length * slot;
         fft.work = 2 * fft.stage;
@@ -267,8 +258,8 @@ LaneFft FftTables::down_lanes(int length, int packs) {
 
     fft.pitch = second | 1;  // an even one would have slots share a few lines of the cache
     fft.work = 2 * std::max(first, second) * slot;
-    fft.stage = std::max(first, second) * slot * packs;
-    fft.tile = first * fft.pitch * slot * packs;
+    fft.stage = std::max(first, second) * slot * kStripPacks;
+    fft.tile = first * fft.pitch * slot * kStripPacks;
     return fft;
 }
 
@@ -276,41 +267,35 @@ RowFft FftTables::along_row() {
     PassChoice passes;
     RowFft row;
     const int second = split(passes, kind_.length, kind_.lanes).second, first = kind_.length / second;
-    const std::ptrdiff_t slot = 2 * std::ptrdiff_t{kind_.lanes};
-    row.first = down_lanes(first, kStripPacks);
-    row.second = down_lanes(second, kStripPacks);
+    row.first = take_apart(first);
+    row.second = take_apart(second);
     row.pitch = 16 * (second / 8 | 1) + (second % 8 != 0 ? 32 : 0);  // whole lines of the cache, an odd number
     row.tile = first * row.pitch;
     turn_lanes(row);
-    row.lanes = std::max(row.second.two_steps() ? second : 0, row.packs ? first : 0) * kStripPacks * slot;
     return row;
 }
 
 void FftTables::turn_lanes(RowFft& row) {
-    const int first = row.first.length(), second = row.second.length(), lanes = kind_.lanes;
-    const int packs = packs_of(second, lanes), hop = row.first.two_steps() ? row.first.first.length : 1;
+    const int first = row.first.length, second = row.second.length, lanes = kind_.lanes;
+    const int packs = packs_of(second, lanes);
     const Roots root{kind_.length, kind_.forward};
-    const auto result = [&](int k) {
-        return k % hop + std::int64_t{hop} * result_of(k / hop, first / hop, kind_.forward);
-    };
-    const int whole = kind_.length < kLongRow ? packs : 1;
-    turns_.reserve(static_cast<std::size_t>(whole) * static_cast<std::size_t>(first) * 2 *
-                   static_cast<std::size_t>(lanes));
-    for (int b = 0; b < whole; ++b)
+    turned_ =
+        2 * static_cast<std::size_t>(packs) * static_cast<std::size_t>(lanes) * static_cast<std::size_t>(first);
+    turns_ = allocate_floats(turned_);
+    if (!turns_) throw std::bad_alloc{};
+    float* to = turns_.get();
+    for (int b = 0; b < packs; ++b)
         for (int k = 0; k < first; ++k)
             for (const auto part : {&FftRoot::re, &FftRoot::im})
                 for (int i = 0; i < lanes; ++i)
-                    turns_.push_back(root(result(k) * (lane_of(b, lanes, second) + i)).*part);
-    row.turns = turns_.data();
-    if (whole == packs) return;
-    std::vector<FftRoot> of_packs;
-    for (int b = 0; b < packs; ++b)
-        for (int k = 0; k < first; ++k) of_packs.push_back(root(result(k) * lane_of(b, lanes, second)));
-    row.packs = keep(std::move(of_packs));
+                    *to++ =
+                        root(std::int64_t{result_of(k, first, kind_.forward)} * (lane_of(b, lanes, second) + i)).*
+                        part;
+    row.turns = turns_.get();
 }
 
 std::size_t FftTables::bytes() const noexcept {
-    std::size_t floats = room() + turns_.size();
+    std::size_t floats = room() + turned_;
     for (const auto& roots : roots_) floats += roots.size() * (sizeof(FftRoot) / sizeof(float));
     return floats * sizeof(float);
 }

@@ -9,6 +9,7 @@
 
 #include "signallib/fft_engine.h"
 #include "signallib/own_fft/fft_kernels.h"
+#include "signallib/spare_floats.h"
 
 namespace quo {
 
@@ -50,14 +51,15 @@ public:
 private:
     [[nodiscard]] const FftRoot* keep(std::vector<FftRoot> roots);
     [[nodiscard]] ShortFft take_apart(int length);
-    [[nodiscard]] LaneFft down_lanes(int length, int packs);
+    [[nodiscard]] LaneFft down_lanes(int length);
     [[nodiscard]] RowFft along_row();
     void turn_lanes(RowFft& row);
 
     FftKind kind_;
     const FftKernels* kernels_;
     std::vector<std::vector<FftRoot>> roots_;
-    std::vector<float> turns_;
+    Floats turns_;            ///< in whole lines of the cache: half of all loads would cross them otherwise
+    std::size_t turned_ = 0;  ///< floats of them
     LaneFft lanes_;
     RowFft row_;
 };

@@ -89,6 +89,14 @@ struct LaneFfts {
         *reinterpret_cast<Loose*>(to) = __builtin_shufflevector(c.re, c.im, (I / 2 + I % 2 * W)...);
         *reinterpret_cast<Loose*>(to + W) = __builtin_shufflevector(c.re, c.im, (W / 2 + I / 2 + I % 2 * W)...);
     }
+    /** In registers from here on: the compiler would rather read what is used twice from memory twice, though
+     * each butterfly waits for its loads already. */
+    QUO_FFT_INLINE C held(C c) {
+#if defined(__x86_64__)
+        asm("" : "+v"(c.re), "+v"(c.im));
+#endif
+        return c;
+    }
     template <bool Interleaved>
     QUO_FFT_INLINE C load(const float* from) {
         const V a = *reinterpret_cast<const Loose*>(from), b = *reinterpret_cast<const Loose*>(from + W);
@@ -180,12 +188,10 @@ struct LaneFfts {
     // --- Passes
     // --------------------------------------------------------------------------------------------------
 
-    /** What results are turned by, if anything: all lanes by one root, or each by its own, from slots `lanes_step`
-     * apart. */
+    /** What results are turned by, if anything: all lanes by one root, or each by its own, in slots. */
     struct Outer {
         const FftRoot* roots = nullptr;
         const float* lanes = nullptr;
-        std::ptrdiff_t lanes_step = kSlot;
     };
     /** A pass from slots `in_step` apart to slots `out_step` apart. `zero` takes result 0. */
     struct Route {
@@ -201,7 +207,6 @@ struct LaneFfts {
     static void pass(const FftPass& pass, const Route& route) {
         const std::ptrdiff_t in_hop = pass.count * pass.stride * route.in_step;
         const std::ptrdiff_t out_hop = pass.stride * route.out_step;
-        const std::ptrdiff_t lanes_step = route.outer.lanes_step, lanes_hop = pass.stride * lanes_step;
         const FftRoot* roots = T == kOuter ? route.outer.roots : pass.roots;
         for (int p = 0; p < pass.count; ++p) {
             const float* from = route.in + std::ptrdiff_t{p} * pass.stride * route.in_step;
@@ -216,7 +221,7 @@ struct LaneFfts {
                     each<R>([&](auto k) QUO_FFT_HERE { x[k] = turn(x[k], roots[q + k * pass.stride]); });
                 if constexpr (T == kLanes)
                     each<R>([&](auto k) QUO_FFT_HERE {
-                        x[k] = turn(x[k], load<false>(route.outer.lanes + q * lanes_step + k * lanes_hop));
+                        x[k] = turn(x[k], held(load<false>(route.outer.lanes + (q + k * pass.stride) * kSlot)));
                     });
                 save<OutInterleaved>(x[0], T != kInner && q == 0 ? route.zero : to);
                 each<R - 1>([&](auto k) QUO_FFT_HERE { save<OutInterleaved>(x[k + 1], to + (k + 1) * out_hop); });
@@ -318,62 +323,47 @@ struct LaneFfts {
         }
     }
 
-    /** `packs` packs of columns in two steps, those that are split one behind the other. Interleaved slots pass
-     * through a stage of `floats` floats a row. */
-    static void two_steps(const LaneFft& fft, From in, To out, int packs, std::ptrdiff_t floats,
-                          const float* turns, float* room) {
-        const int n1 = fft.second.length, n2 = fft.first.length;
-        const std::ptrdiff_t pack = fft.length() * kSlot;
-        float *const work = room, *const stage = work + fft.work, *const tile = stage + fft.stage;
+    /** So many columns in two steps, a pack of those that are split behind the other: through a stage whose rows
+     * lie close together. */
+    static void two_steps(const LaneFft& fft, const FftColumns& columns, float* room) {
+        const int n1 = fft.second.length, n2 = fft.first.length, packs = (columns.count + W - 1) / W;
+        const std::ptrdiff_t step = columns.step, floats = 2 * std::ptrdiff_t{columns.count};
         const std::ptrdiff_t stage_step = packs * kSlot, tile_row = packs * fft.pitch * kSlot;
+        float *const work = room, *const stage = work + fft.work, *const tile = stage + fft.stage;
         for (int i = 0; i < n1; ++i) {
-            if (in.form == kInterleaved) {
-                move(in.at + i * in.step, n1 * in.step, stage, stage_step, n2, floats);
-                if (i + 1 < n1) ask_first(in.at + (i + 1) * in.step, n1 * in.step, n2, floats);
-            }
-            for (int b = 0; b < packs; ++b) {
-                const From from = in.form == kInterleaved
-                                      ? From{stage + b * kSlot, stage_step, kInterleaved}
-                                      : From{in.at + b * pack + i * in.step, n1 * in.step, kSplit};
-                run(fft.first, from, {tile + (b * fft.pitch + i) * kSlot, tile_row, kSplit},
-                    {fft.outer + std::ptrdiff_t{i} * n2}, work);
-            }
+            const float* const in = columns.in + i * step;
+            move(in, n1 * step, stage, stage_step, n2, floats);
+            if (i + 1 < n1) ask_first(in + step, n1 * step, n2, floats);
+            for (int b = 0; b < packs; ++b)
+                run(fft.first, {stage + b * kSlot, stage_step, kInterleaved},
+                    {tile + (b * fft.pitch + i) * kSlot, tile_row, kSplit}, {fft.outer + std::ptrdiff_t{i} * n2},
+                    work);
         }
         for (int k = 0; k < n2; ++k) {
-            ask_first(out.at + k * out.step, n2 * out.step, n1, floats);
+            float* const out = columns.out + k * step;
+            ask_first(out, n2 * step, n1, floats);
             for (int b = 0; b < packs; ++b)
                 run(fft.second, {tile + (k * packs + b) * fft.pitch * kSlot, kSlot, kSplit},
-                    {stage + b * kSlot, stage_step, kInterleaved},
-                    {nullptr, turns ? turns + b * pack + k * kSlot : nullptr, n2 * kSlot}, work);
-            move(stage, stage_step, out.at + k * out.step, n2 * out.step, n1, floats);
+                    {stage + b * kSlot, stage_step, kInterleaved}, {}, work);
+            move(stage, stage_step, out, n2 * step, n1, floats);
         }
     }
-    /** Whole packs: more than one in two steps only. */
-    static void whole_packs(const LaneFft& fft, From in, To out, int packs, const float* turns, float* room) {
-        if (fft.two_steps()) return two_steps(fft, in, out, packs, packs * kSlot, turns, room);
-        run(fft.first, in, out, {nullptr, turns}, room);
-    }
-    /** Columns that fill no pack. */
-    static void part_pack(const LaneFft& fft, From in, To out, std::ptrdiff_t floats, float* room) {
+    /** No more columns than lanes. */
+    static void one_step(const LaneFft& fft, const FftColumns& columns, float* room) {
+        const std::ptrdiff_t step = columns.step, floats = 2 * std::ptrdiff_t{columns.count};
+        if (columns.count == W)
+            return run(fft.first, {columns.in, step, kInterleaved}, {columns.out, step, kInterleaved}, {}, room);
         float* const stage = room + fft.work;
-        move(in.at, in.step, stage, kSlot, fft.first.length, floats);
+        move(columns.in, step, stage, kSlot, fft.first.length, floats);
         run(fft.first, {stage, kSlot, kInterleaved}, {stage, kSlot, kInterleaved}, {}, room);
-        move(stage, kSlot, out.at, out.step, fft.first.length, floats);
+        move(stage, kSlot, columns.out, step, fft.first.length, floats);
     }
-
     static void columns(const LaneFft& fft, const FftColumns& columns, float* room) noexcept {
         const int width = fft.two_steps() ? kStripPacks * W : W;
-        for (int c = 0; c < columns.count; c += width) {
-            const int some = columns.count - c < width ? columns.count - c : width;
-            const From in{columns.in + 2 * std::ptrdiff_t{c}, columns.step, kInterleaved};
-            const To out{columns.out + 2 * std::ptrdiff_t{c}, columns.step, kInterleaved};
-            const std::ptrdiff_t floats = 2 * std::ptrdiff_t{some};
-            if (fft.two_steps())
-                two_steps(fft, in, out, (some + W - 1) / W, floats, nullptr, room);
-            else if (some == W)
-                whole_packs(fft, in, out, 1, nullptr, room);
-            else
-                part_pack(fft, in, out, floats, room);
+        for (std::ptrdiff_t c = 0; c < columns.count; c += width) {
+            const int left = columns.count - static_cast<int>(c);
+            (fft.two_steps() ? two_steps : one_step)(
+                fft, {columns.in + 2 * c, columns.out + 2 * c, columns.step, left < width ? left : width}, room);
         }
     }
 
@@ -425,53 +415,29 @@ struct LaneFfts {
     /** First of a pack's lanes: the last pack overlaps the one before it. */
     QUO_FFT_INLINE int lane_of(int pack, int count) { return (pack + 1) * W <= count ? pack * W : count - W; }
 
-    /** Packs that are moved together from the one that begins at `lane`. */
-    QUO_FFT_INLINE int strip_of(const LaneFft& fft, int lane, int count) {
-        return fft.two_steps() && lane + kStripPacks * W <= count ? kStripPacks : 1;
-    }
-    /** What the results of some packs are turned by, in `room` if they are not kept. */
-    static const float* turns_of(const RowFft& fft, int pack, int packs, float* room) {
-        const int n2 = fft.first.length();
-        const std::ptrdiff_t at = std::ptrdiff_t{pack} * n2;
-        if (!fft.packs) return fft.turns + at * kSlot;
-        for (int k = 0; k < packs * n2; ++k)
-            save<false>(turn(load<false>(fft.turns + k % n2 * kSlot), fft.packs[at + k]), room + k * kSlot);
-        return room;
-    }
     /** Step 1: what it leaves is a row of the tile for each of its results. The `next` row is asked for on the
      * way, into the second cache: all at once it would keep what this one needs waiting. */
     static void across_samples(const RowFft& fft, const float* in, const float* next, float* tile, float* room) {
         constexpr std::ptrdiff_t kMostAsked = 1 << 15;
-        const int n1 = fft.second.length();
-        const std::ptrdiff_t share = fft.first.length() * kSlot;
-        for (int b = 0, packs = 0; b * W < n1; b += packs) {
+        const int n1 = fft.second.length;
+        const std::ptrdiff_t share = fft.first.length * kSlot;
+        for (int b = 0; b * W < n1; ++b) {
             const int lane = lane_of(b, n1);
-            packs = strip_of(fft.first, lane, n1);
-            if (b * share < kMostAsked) ask<2>(next + b * share, packs * share);
-            whole_packs(fft.first, {in + 2 * lane, 2 * std::ptrdiff_t{n1}, kInterleaved},
-                        {tile + 2 * lane, fft.pitch, kInterleaved}, packs, turns_of(fft, b, packs, room),
-                        room + fft.lanes);
+            if (b * share < kMostAsked) ask<2>(next + b * share, share);
+            run(fft.first, {in + 2 * lane, 2 * std::ptrdiff_t{n1}, kInterleaved},
+                {tile + 2 * lane, fft.pitch, kInterleaved}, {nullptr, fft.turns + b * share}, room);
         }
     }
     /** Step 2: W rows of the tile are the lanes. */
     static void across_results(const RowFft& fft, const float* tile, float* out, float* room) {
-        const int n1 = fft.second.length(), n2 = fft.first.length();
+        const int n2 = fft.first.length;
         const std::ptrdiff_t step = 2 * std::ptrdiff_t{n2};
-        if (!fft.second.two_steps() && fft.second.first.passes == 1)
-            return run(fft.second.first, {tile, fft.pitch, kAcross}, {out, step, kInterleaved}, {}, room);
-        float *const lanes = room, *const rest = room + fft.lanes;
-        for (int c = 0, packs = 0; c * W < n2; c += packs) {
+        if (fft.second.passes == 1)
+            return run(fft.second, {tile, fft.pitch, kAcross}, {out, step, kInterleaved}, {}, room);
+        for (int c = 0; c * W < n2; ++c) {
             const int result = lane_of(c, n2);
-            packs = strip_of(fft.second, result, n2);
-            From from{tile + result * fft.pitch, fft.pitch, kAcross};
-            if (fft.second.two_steps()) {
-                for (int b = 0; b < packs; ++b, from.at += W * from.step) {
-                    float* const to = lanes + b * std::ptrdiff_t{n1} * kSlot;
-                    row_kernels(1).in({1, n1, 1, nullptr}, {from.at, to, to, from.step});
-                }
-                from = {lanes, kSlot, kSplit};
-            }
-            whole_packs(fft.second, from, {out + 2 * result, step, kInterleaved}, packs, nullptr, rest);
+            run(fft.second, {tile + result * fft.pitch, fft.pitch, kAcross},
+                {out + 2 * result, step, kInterleaved}, {}, room);
         }
     }
     static void rows(const RowFft& fft, const FftRows& rows, float* room) noexcept {
