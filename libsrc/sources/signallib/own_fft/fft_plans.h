@@ -3,7 +3,6 @@
 #define QUO_FFT_PLANS_H
 
 #include <cstddef>
-#include <cstdint>
 #include <tuple>
 #include <vector>
 
@@ -12,8 +11,6 @@
 #include "signallib/spare_floats.h"
 
 namespace quo {
-
-enum class FftWay : std::uint8_t { Columns, Rows, ShortRows };
 
 /** What tables are made for. */
 struct FftKind {
@@ -42,7 +39,7 @@ public:
     FftTables& operator=(const FftTables&) = delete;
 
     /** Floats that a run works in. */
-    [[nodiscard]] std::size_t room() const noexcept;
+    [[nodiscard]] std::size_t room() const noexcept { return static_cast<std::size_t>(fft_.room()); }
     /** Bytes of the tables and of that room. */
     [[nodiscard]] std::size_t bytes() const noexcept;
     /** Transforms `count` rows or columns; `pitch` floats lie between rows of the image. */
@@ -51,17 +48,15 @@ public:
 private:
     [[nodiscard]] const FftRoot* keep(std::vector<FftRoot> roots);
     [[nodiscard]] ShortFft take_apart(int length);
-    [[nodiscard]] LaneFft down_lanes(int length);
-    [[nodiscard]] RowFft along_row();
-    void turn_lanes(RowFft& row);
+    void lay_out_rows();
+    void lay_out_columns();
 
     FftKind kind_;
     const FftKernels* kernels_;
     std::vector<std::vector<FftRoot>> roots_;
     Floats turns_;            ///< in whole lines of the cache: half of all loads would cross them otherwise
     std::size_t turned_ = 0;  ///< floats of them
-    LaneFft lanes_;
-    RowFft row_;
+    FftSteps fft_;
 };
 
 /** Bytes that the tables and the room of one run take. */

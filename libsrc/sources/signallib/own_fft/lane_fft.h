@@ -57,10 +57,20 @@ struct LaneFfts {
     }
     QUO_FFT_INLINE C add(C a, C b) { return {a.re + b.re, a.im + b.im}; }
     QUO_FFT_INLINE C subtract(C a, C b) { return {a.re - b.re, a.im - b.im}; }
-    template <class Root>
-    QUO_FFT_INLINE C turn(C a, const Root& by) {
-        const V re = by.re - V{}, im = by.im - V{};  // not 0 +, which would be computed: it turns -0 into 0
-        return {fused(-a.im, im, a.re * re), fused(a.im, re, a.re * im)};
+    QUO_FFT_INLINE C turn(C a, C by) {
+        return {fused(-a.im, by.im, a.re * by.re), fused(a.im, by.re, a.re * by.im)};
+    }
+    /** One root in all lanes. */
+    QUO_FFT_INLINE C spread(FftRoot root) {
+        return {root.re - V{}, root.im - V{}};  // not 0 +, which would be computed: it turns -0 into 0
+    }
+    /** In registers from here on: the compiler would rather read what is used twice from memory twice, though
+     * each butterfly waits for its loads already. */
+    QUO_FFT_INLINE C held(C c) {
+#if defined(__x86_64__)
+        asm("" : "+v"(c.re), "+v"(c.im));
+#endif
+        return c;
     }
     /** Turned by exp(-2 pi i K / N). */
     template <int K, int N>
@@ -74,7 +84,7 @@ struct LaneFfts {
         if constexpr (kEighths == 6) return {-a.im, a.re};
         if constexpr (kEighths == 1 || kEighths == 5) return {(a.re + a.im) * kRe, (a.im - a.re) * kRe};
         if constexpr (kEighths == 3 || kEighths == 7) return {(a.re - a.im) * kRe, (a.re + a.im) * kRe};
-        return turn(a, FftRoot{kRe, kIm});
+        return turn(a, spread({kRe, kIm}));
     }
 
     // --- Slots
@@ -88,14 +98,6 @@ struct LaneFfts {
     QUO_FFT_INLINE void join(C c, float* to, std::index_sequence<I...> /*lanes*/) {
         *reinterpret_cast<Loose*>(to) = __builtin_shufflevector(c.re, c.im, (I / 2 + I % 2 * W)...);
         *reinterpret_cast<Loose*>(to + W) = __builtin_shufflevector(c.re, c.im, (W / 2 + I / 2 + I % 2 * W)...);
-    }
-    /** In registers from here on: the compiler would rather read what is used twice from memory twice, though
-     * each butterfly waits for its loads already. */
-    QUO_FFT_INLINE C held(C c) {
-#if defined(__x86_64__)
-        asm("" : "+v"(c.re), "+v"(c.im));
-#endif
-        return c;
     }
     template <bool Interleaved>
     QUO_FFT_INLINE C load(const float* from) {
@@ -200,31 +202,46 @@ struct LaneFfts {
         std::ptrdiff_t in_step, out_step = kSlot;
         Outer outer{};
         float sign = 1.0F;  ///< of imaginary parts that become lanes or come from them
+        int many = W;       ///< rows or columns that one pass is all of
     };
     enum Turns { kNone, kInner, kOuter, kLanes };
+
+    template <bool Interleaved, int R>
+    QUO_FFT_INLINE void save_all(const C (&x)[R], float* to, float* zero, std::ptrdiff_t hop) {
+        save<Interleaved>(x[0], zero);
+        each<R - 1>([&](auto k) QUO_FFT_HERE { save<Interleaved>(x[k + 1], to + (k + 1) * hop); });
+    }
 
     template <int R, bool InInterleaved, bool OutInterleaved, Turns T>
     static void pass(const FftPass& pass, const Route& route) {
         const std::ptrdiff_t in_hop = pass.count * pass.stride * route.in_step;
         const std::ptrdiff_t out_hop = pass.stride * route.out_step;
         const FftRoot* roots = T == kOuter ? route.outer.roots : pass.roots;
+        // Columns that one pass is all of: their packs lie side by side.
+        constexpr bool kPacks = InInterleaved && T == kNone;
+        const int some = kPacks ? route.many / W : pass.stride;
+        const std::ptrdiff_t in_next = kPacks ? kSlot : route.in_step, out_next = kPacks ? kSlot : route.out_step;
         for (int p = 0; p < pass.count; ++p) {
             const float* from = route.in + std::ptrdiff_t{p} * pass.stride * route.in_step;
             float* to = route.out + std::ptrdiff_t{p} * R * out_hop;
-            for (int q = 0; q < pass.stride; ++q, from += route.in_step, to += route.out_step) {
+            for (int q = 0; q < some; ++q, from += in_next, to += out_next) {
                 C x[R];
-                each<R>([&](auto j) QUO_FFT_HERE { x[j] = load<InInterleaved>(from + j * in_hop); });
+                each<R>([&](auto j) QUO_FFT_HERE {
+                    x[j] = load<InInterleaved>(from + j * in_hop);
+                    if constexpr (Level == ProcessorLevel::kAvx512 && R <= 8) x[j] = held(x[j]);
+                });
                 butterfly<R>(x);
                 if constexpr (T == kInner)
-                    each<R - 1>([&](auto k) QUO_FFT_HERE { x[k + 1] = turn(x[k + 1], roots[k]); });
+                    each<R - 1>([&](auto k) QUO_FFT_HERE { x[k + 1] = turn(x[k + 1], held(spread(roots[k]))); });
                 if constexpr (T == kOuter)
-                    each<R>([&](auto k) QUO_FFT_HERE { x[k] = turn(x[k], roots[q + k * pass.stride]); });
+                    each<R>([&](auto k)
+                                QUO_FFT_HERE { x[k] = turn(x[k], held(spread(roots[q + k * pass.stride]))); });
                 if constexpr (T == kLanes)
                     each<R>([&](auto k) QUO_FFT_HERE {
                         x[k] = turn(x[k], held(load<false>(route.outer.lanes + (q + k * pass.stride) * kSlot)));
                     });
-                save<OutInterleaved>(x[0], T != kInner && q == 0 ? route.zero : to);
-                each<R - 1>([&](auto k) QUO_FFT_HERE { save<OutInterleaved>(x[k + 1], to + (k + 1) * out_hop); });
+                float* const zero = kPacks ? route.zero + q * kSlot : T != kInner && q == 0 ? route.zero : to;
+                save_all<OutInterleaved>(x, to, zero, out_hop);
             }
             if constexpr (T == kInner) roots += R - 1;
         }
@@ -262,20 +279,21 @@ struct LaneFfts {
         return in == kInterleaved ? find<true, false, kInner>(radix) : find<false, false, kInner>(radix);
     }
     static PassKernel last_pass(int radix, Form in, Form out, const Outer& outer) {
-        if (in == kAcross) return row_kernels(radix).across;
+        if (in == kAcross) return out == kAcross ? row_kernels(radix).whole : row_kernels(radix).across;
         const bool apart = in == kSplit;
         if (out == kAcross) return row_kernels(radix).out;
         if (outer.lanes) return apart ? find<false, true, kLanes>(radix) : find<true, true, kLanes>(radix);
         if (outer.roots) return apart ? find<false, false, kOuter>(radix) : find<true, false, kOuter>(radix);
         return apart ? find<false, true, kNone>(radix) : find<true, true, kNone>(radix);
     }
-    /** `work` holds the transform twice. Backward transforms are forward ones whose results stand in the opposite
-     * order, or the conjugate ones of conjugate rows. */
-    static void run(const ShortFft& fft, From in, To out, Outer outer, float* work) {
+    /** `many` of them, if one pass is all; `work` holds the transform twice. Backward transforms are forward ones
+     * whose results stand in the opposite order, or the conjugate ones of conjugate rows. */
+    static void run(const ShortFft& fft, From in, To out, Outer outer, float* work, int many = W) {
         const int last = fft.passes - 1;
         Route route{in.at, work, work, in.step, kSlot, outer};
         const bool conjugate = fft.backward && out.form == kAcross;
         if (conjugate) route.sign = -1.0F;
+        route.many = many;
         for (int k = 0; k < last; ++k) {
             float* const next = route.out == work ? work + fft.length * kSlot : work;
             first_pass(fft.pass[k].radix, k == 0 ? in.form : kSplit)(fft.pass[k], route);
@@ -325,7 +343,7 @@ struct LaneFfts {
 
     /** So many columns in two steps, a pack of those that are split behind the other: through a stage whose rows
      * lie close together. */
-    static void two_steps(const LaneFft& fft, const FftColumns& columns, float* room) {
+    static void two_steps(const FftSteps& fft, const FftImage& columns, float* room) {
         const int n1 = fft.second.length, n2 = fft.first.length, packs = (columns.count + W - 1) / W;
         const std::ptrdiff_t step = columns.step, floats = 2 * std::ptrdiff_t{columns.count};
         const std::ptrdiff_t stage_step = packs * kSlot, tile_row = packs * fft.pitch * kSlot;
@@ -348,21 +366,23 @@ struct LaneFfts {
             move(stage, stage_step, out, n2 * step, n1, floats);
         }
     }
-    /** No more columns than lanes. */
-    static void one_step(const LaneFft& fft, const FftColumns& columns, float* room) {
+    /** Whole packs, of which more than one are a single pass; or no more columns than lanes. */
+    static void one_step(const FftSteps& fft, const FftImage& columns, float* room) {
         const std::ptrdiff_t step = columns.step, floats = 2 * std::ptrdiff_t{columns.count};
-        if (columns.count == W)
-            return run(fft.first, {columns.in, step, kInterleaved}, {columns.out, step, kInterleaved}, {}, room);
+        if (columns.count % W == 0)
+            return run(fft.first, {columns.in, step, kInterleaved}, {columns.out, step, kInterleaved}, {}, room,
+                       columns.count);
         float* const stage = room + fft.work;
         move(columns.in, step, stage, kSlot, fft.first.length, floats);
         run(fft.first, {stage, kSlot, kInterleaved}, {stage, kSlot, kInterleaved}, {}, room);
         move(stage, kSlot, columns.out, step, fft.first.length, floats);
     }
-    static void columns(const LaneFft& fft, const FftColumns& columns, float* room) noexcept {
-        const int width = fft.two_steps() ? kStripPacks * W : W;
+    static void columns(const FftSteps& fft, const FftImage& columns, float* room) noexcept {
+        const bool whole = !fft.two() && fft.first.passes == 1 && columns.count > W;
+        const int width = whole ? columns.count / W * W : fft.two() ? kStripPacks * W : W;
         for (std::ptrdiff_t c = 0; c < columns.count; c += width) {
             const int left = columns.count - static_cast<int>(c);
-            (fft.two_steps() ? two_steps : one_step)(
+            (fft.two() ? two_steps : one_step)(
                 fft, {columns.in + 2 * c, columns.out + 2 * c, columns.step, left < width ? left : width}, room);
         }
     }
@@ -417,7 +437,7 @@ struct LaneFfts {
 
     /** Step 1: what it leaves is a row of the tile for each of its results. The `next` row is asked for on the
      * way, into the second cache: all at once it would keep what this one needs waiting. */
-    static void across_samples(const RowFft& fft, const float* in, const float* next, float* tile, float* room) {
+    static void across_samples(const FftSteps& fft, const float* in, const float* next, float* tile, float* room) {
         constexpr std::ptrdiff_t kMostAsked = 1 << 15;
         const int n1 = fft.second.length;
         const std::ptrdiff_t share = fft.first.length * kSlot;
@@ -429,23 +449,23 @@ struct LaneFfts {
         }
     }
     /** Step 2: W rows of the tile are the lanes. */
-    static void across_results(const RowFft& fft, const float* tile, float* out, float* room) {
+    static void across_results(const FftSteps& fft, const float* tile, float* out, float* room) {
         const int n2 = fft.first.length;
         const std::ptrdiff_t step = 2 * std::ptrdiff_t{n2};
         if (fft.second.passes == 1)
-            return run(fft.second, {tile, fft.pitch, kAcross}, {out, step, kInterleaved}, {}, room);
+            return run(fft.second, {tile, fft.pitch, kAcross}, {out, step, kInterleaved}, {}, room, n2);
         for (int c = 0; c * W < n2; ++c) {
             const int result = lane_of(c, n2);
             run(fft.second, {tile + result * fft.pitch, fft.pitch, kAcross},
                 {out + 2 * result, step, kInterleaved}, {}, room);
         }
     }
-    static void rows(const RowFft& fft, const FftRows& rows, float* room) noexcept {
+    static void rows(const FftSteps& fft, const FftImage& rows, float* room) noexcept {
         float* const rest = room + fft.tile;
         for (std::ptrdiff_t row = 0; row < rows.count; ++row) {
-            const float* const in = rows.in + row * rows.distance;
-            across_samples(fft, in, row + 1 < rows.count ? in + rows.distance : in, room, rest);
-            across_results(fft, room, rows.out + row * rows.distance, rest);
+            const float* const in = rows.in + row * rows.step;
+            across_samples(fft, in, row + 1 < rows.count ? in + rows.step : in, room, rest);
+            across_results(fft, room, rows.out + row * rows.step, rest);
         }
     }
 
@@ -480,38 +500,33 @@ struct LaneFfts {
             load_two(from + 2 * at, gap, x[at], x[at + 1]);
         });
     }
-    /** `packs` times W rows whose samples registers hold. */
-    template <int N>
-    static void tiny_rows(const float* in, float* out, const Gap& gap, int packs) {
-        for (int pack = 0; pack < packs; ++pack, in += W * gap.step, out += W * gap.step) {
+    /** Rows whose samples registers hold: they become rows again, or slots, so many that these lie side by side.
+     */
+    template <int N, bool RowsAgain>
+    static void whole_rows(const FftPass& /*pass*/, const Route& route) {
+        const Gap in{route.in_step, route.sign}, out{route.out_step, route.sign};
+        const std::ptrdiff_t out_row = RowsAgain ? out.step : 2;
+        const int rows = route.many;
+        const float* from = route.in;
+        float* to = route.out;
+        for (int row = 0, hop = 0; row < rows; row += hop, from += hop * in.step, to += hop * out_row) {
+            const int left = rows - row - W;
+            hop = left == 0 || left >= W ? W : left;  // the last pack overlaps the one before it
             if constexpr (N == 1) {
-                each<W>([&](auto row) QUO_FFT_HERE {
-                    std::memcpy(out + row * gap.step, in + row * gap.step, sizeof(FftRoot));
-                });
+                each<W>([&](auto i)
+                            QUO_FFT_HERE { std::memcpy(to + i * out.step, from + i * in.step, sizeof(FftRoot)); });
             } else {
                 C x[N];
-                load_rows(in, gap, x);
+                load_rows(from, in, x);
                 butterfly<N>(x);
-                each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
-                    constexpr int at = pair_of(2 * i, N);
-                    save_two(x[at], x[at + 1], out + 2 * at, gap);
-                });
+                if constexpr (RowsAgain)
+                    each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
+                        constexpr int at = pair_of(2 * i, N);
+                        save_two(x[at], x[at + 1], to + 2 * at, out);
+                    });
+                else
+                    save_all<true>(x, to, route.zero + 2 * row, out.step);
             }
-        }
-    }
-    /** Rows whose samples registers hold become slots: so many that their slots lie side by side. */
-    template <int N>
-    static void pass_across(const FftPass& /*pass*/, const Route& route) {
-        const auto rows = static_cast<int>((route.out_step < 0 ? -route.out_step : route.out_step) / 2);
-        for (int c = 0; c * W < rows; ++c) {
-            const int row = lane_of(c, rows);
-            C x[N];
-            load_rows(route.in + row * route.in_step, {route.in_step, 1.0F}, x);
-            butterfly<N>(x);
-            save<true>(x[0], route.zero + 2 * row);
-            each<N - 1>([&](auto k) QUO_FFT_HERE {
-                save<true>(x[k + 1], route.out + 2 * row + (k + 1) * route.out_step);
-            });
         }
     }
     /** The first pass over W rows, which become slots. */
@@ -528,8 +543,9 @@ struct LaneFfts {
                 float* const to = route.out + (at + i) * R * kSlot;
                 butterfly<R>(x[i]);
                 save<false>(x[i][0], to);
-                each<R - 1>([&](auto k)
-                                QUO_FFT_HERE { save<false>(turn(x[i][k + 1], roots[k]), to + (k + 1) * kSlot); });
+                each<R - 1>([&](auto k) QUO_FFT_HERE {
+                    save<false>(turn(x[i][k + 1], held(spread(roots[k]))), to + (k + 1) * kSlot);
+                });
             });
         }
     }
@@ -550,53 +566,46 @@ struct LaneFfts {
                         QUO_FFT_HERE { save_two(x[0][k], x[1][k], route.out + 2 * (at + k * pass.stride), gap); });
         }
     }
-    /** Rows that are transformed across have a sample for every lane at least. */
-    template <int R>
-    static constexpr PassKernel across_of() {
-        if constexpr (R >= W) return pass_across<R>;
-        return nullptr;
-    }
     struct RowKernels {
-        void (*tiny)(const float*, float*, const Gap&, int) = nullptr;
-        PassKernel in = nullptr, out = nullptr, across = nullptr;
+        PassKernel whole = nullptr, in = nullptr, out = nullptr, across = nullptr;
     };
     template <int... R>
     static constexpr std::array<RowKernels, kRadices> row_table(std::integer_sequence<int, R...> /*radices*/) {
         std::array<RowKernels, kRadices> table{};
-        ((table[R].in = pass_in<R>), ...);
-        ((table[R].across = across_of<R>()), ...);
-        if constexpr (kShortRows) ((table[R].tiny = tiny_rows<R>, table[R].out = pass_out<R>), ...);
+        // Rows that are transformed across have a sample for every lane at least.
+        ((table[R].in = pass_in<R>, table[R].across = whole_rows<(R < W ? W : R), false>), ...);
+        if constexpr (kShortRows) ((table[R].whole = whole_rows<R, true>, table[R].out = pass_out<R>), ...);
         return table;
     }
     static const RowKernels& row_kernels(int radix) {
         static constexpr auto kTable = row_table(Radices{});
         return kTable[static_cast<std::size_t>(radix)];
     }
-    /** `packs` times W rows. */
-    static void row_packs(const ShortFft& fft, FftRows rows, const Gap& gap, int packs, float* work) {
-        if (fft.passes == 1) return row_kernels(fft.pass[0].radix).tiny(rows.in, rows.out, gap, packs);
-        for (; packs > 0; --packs, rows.in += W * gap.step, rows.out += W * gap.step)
-            run(fft, {rows.in, gap.step, kAcross}, {rows.out, gap.step, kAcross}, {}, work);
+    /** Packs of W rows. */
+    static void row_packs(const ShortFft& fft, const FftImage& rows, float* work) {
+        const int together = fft.passes == 1 ? rows.count : W;
+        for (std::ptrdiff_t row = 0; row < rows.count; row += together)
+            run(fft, {rows.in + row * rows.step, rows.step, kAcross},
+                {rows.out + row * rows.step, rows.step, kAcross}, {}, work, together);
     }
-    static void short_rows(const LaneFft& fft, const FftRows& rows, float* room) noexcept {
-        const std::ptrdiff_t floats = 2 * std::ptrdiff_t{fft.first.length}, step = rows.distance;
+    static void short_rows(const FftSteps& fft, const FftImage& rows, float* room) noexcept {
+        const std::ptrdiff_t floats = 2 * std::ptrdiff_t{fft.first.length}, step = rows.step;
         const std::size_t bytes = sizeof(float) * static_cast<std::size_t>(floats);
-        const float sign = fft.first.backward ? -1.0F : 1.0F;
-        row_packs(fft.first, rows, {step, sign}, rows.count / W, room);
         const int rest = rows.count % W, whole = rows.count - rest;
+        row_packs(fft.first, {rows.in, rows.out, step, whole}, room);
         if (rest == 0) return;
         // The lanes that are left over repeat others.
         float* const stage = room + fft.work;
         for (int row = 0; row < W; ++row)
             std::memcpy(stage + row * floats, rows.in + (whole + row % rest) * step, bytes);
-        row_packs(fft.first, {stage, stage, floats, W}, {floats, sign}, 1, room);
+        row_packs(fft.first, {stage, stage, floats, W}, room);
         for (int row = 0; row < rest; ++row)
             std::memcpy(rows.out + (whole + row) * step, stage + row * floats, bytes);
     }
 
     static constexpr FftKernels kernels() {
-        if constexpr (kShortRows) return {W, columns, rows, short_rows};
-        return {W, columns, rows, nullptr};
+        if constexpr (kShortRows) return {{columns, rows, short_rows}};
+        return {{columns, rows, nullptr}};
     }
 #undef QUO_FFT_HERE
 #undef QUO_FFT_INLINE
