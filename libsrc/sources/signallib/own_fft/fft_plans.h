@@ -2,8 +2,8 @@
 #ifndef QUO_FFT_PLANS_H
 #define QUO_FFT_PLANS_H
 
+#include <compare>
 #include <cstddef>
-#include <tuple>
 #include <vector>
 
 #include "signallib/fft_engine.h"
@@ -19,9 +19,7 @@ struct FftKind {
     bool forward = true;
     int lanes = 4;
 
-    friend bool operator<(const FftKind& a, const FftKind& b) {
-        return std::tie(a.way, a.length, a.forward, a.lanes) < std::tie(b.way, b.length, b.forward, b.lanes);
-    }
+    auto operator<=>(const FftKind&) const = default;
 };
 
 /** Whether a length has no prime factor above 7. */

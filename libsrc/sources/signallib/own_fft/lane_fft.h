@@ -2,6 +2,7 @@
 #ifndef QUO_LANE_FFT_H
 #define QUO_LANE_FFT_H
 
+#include <algorithm>
 #include <array>
 #include <cstddef>
 #include <cstring>
@@ -573,7 +574,7 @@ struct LaneFfts {
     static constexpr std::array<RowKernels, kRadices> row_table(std::integer_sequence<int, R...> /*radices*/) {
         std::array<RowKernels, kRadices> table{};
         // Rows that are transformed across have a sample for every lane at least.
-        ((table[R].in = pass_in<R>, table[R].across = whole_rows<(R < W ? W : R), false>), ...);
+        ((table[R].in = pass_in<R>, table[R].across = whole_rows<std::max(R, W), false>), ...);
         if constexpr (kShortRows) ((table[R].whole = whole_rows<R, true>, table[R].out = pass_out<R>), ...);
         return table;
     }
