@@ -3,6 +3,7 @@
 #define QUO_FFT_KERNELS_H
 
 #include <cstddef>
+#include <cstdint>
 
 /* Transforms whose lengths have no prime factor above 7, several side by side in the lanes of a vector, so that
  * butterflies need no shuffles. One step of a transform stands in a slot: so many complex values as there are
@@ -32,53 +33,37 @@ struct ShortFft {
     bool backward = false;
 };
 
-/** A transform down the lanes, in one step, or in two of about the square root of its length each: step 1 over
- * samples `second.length` apart, turned by `outer` (first.length for each sample of `second`), step 2 over
- * neighbours. */
-struct LaneFft {
-    ShortFft first, second;  ///< the second has no passes where one step is enough
-    const FftRoot* outer = nullptr;
-    std::ptrdiff_t pitch = 0;                      ///< slots from one transform of step 2 to the next
+/** A transform in one step, or in two of about the square root of its length each: step 1 over samples
+ * `second.length` apart, whose results are turned, step 2 over neighbours. Along a row the lanes are neighbours in
+ * step 1, results that are neighbours in step 2. */
+struct FftSteps {
+    ShortFft first, second;          ///< the second has no passes where one step is enough
+    const FftRoot* outer = nullptr;  ///< of columns: first.length for each sample of `second`
+    const float* turns = nullptr;    ///< of rows: a slot for each result of each pack of lanes
+    std::ptrdiff_t pitch = 0;        ///< slots from one transform of step 2 to the next; floats of a row
     std::ptrdiff_t tile = 0, stage = 0, work = 0;  ///< floats of room
 
-    [[nodiscard]] int length() const { return first.length * second.length; }
-    [[nodiscard]] bool two_steps() const { return second.passes > 0; }
+    [[nodiscard]] bool two() const { return second.passes > 0; }
     [[nodiscard]] std::ptrdiff_t room() const { return tile + stage + work; }
 };
 
-/** A transform along a row: its lanes are neighbours in step 1, results that are neighbours in step 2. */
-struct RowFft {
-    LaneFft first, second;
-    const float* turns = nullptr;    ///< of step 1, a slot for each result of each pack of lanes
-    const FftRoot* packs = nullptr;  ///< if any, the turns are those of the first pack, and these are by what
-                                     ///< the results of each pack are turned beyond
-    std::ptrdiff_t pitch = 0;        ///< floats from one result of step 1 to the next
-    std::ptrdiff_t tile = 0, lanes = 0;
-};
-
-/** Columns of images: from one sample to the next, and how many columns. */
-struct FftColumns {
+/** An image: floats from row to row, and how many rows or columns are transformed. */
+struct FftImage {
     const float* in;
     float* out;
     std::ptrdiff_t step;
     int count;
 };
 
-/** Rows of images: from one row to the next, and how many rows. */
-struct FftRows {
-    const float* in;
-    float* out;
-    std::ptrdiff_t distance;
-    int count;
-};
+/** Columns; long rows; short rows, one a lane. */
+enum class FftWay : std::uint8_t { Columns, Rows, ShortRows };
 
-/** The kernels for one width of vector. */
+/** The kernels for one width of vector. That for short rows is null where fewer lanes are as fast. */
 struct FftKernels {
-    int width;  ///< lanes
-    void (*columns)(const LaneFft& fft, const FftColumns& columns, float* room) noexcept;
-    void (*rows)(const RowFft& fft, const FftRows& rows, float* room) noexcept;
-    /** Short rows, as many at a time as there are lanes. Null where fewer lanes are as fast. */
-    void (*short_rows)(const LaneFft& fft, const FftRows& rows, float* room) noexcept;
+    using Kernel = void (*)(const FftSteps& fft, const FftImage& image, float* room) noexcept;
+    Kernel kernels[3];
+
+    [[nodiscard]] Kernel of(FftWay way) const { return kernels[static_cast<std::size_t>(way)]; }
 };
 
 /** Packs of lanes that columns are moved in together. */

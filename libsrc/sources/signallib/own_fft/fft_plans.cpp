@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <limits>
 #include <map>
+#include <new>
 #include <numbers>
 #include <utility>
 
@@ -32,10 +33,6 @@ constexpr double kUnaligned = 4.0;
 constexpr double kPerSample = 0.1;
 /** Lengths up to this one are transformed in one step, whose buffers the first cache holds. */
 constexpr int kOneStep = 128;
-/** The same of the lanes along a row, one pack of them at a time. */
-constexpr int kOneRowStep = 2048;
-/** Rows whose turns, kept whole, would come from memory. */
-constexpr int kLongRow = 1 << 17;
 /** Short rows up to this length, eight at a time, leave room in the first cache. */
 constexpr int kCachedShortRow = 320;
 
@@ -78,16 +75,12 @@ Split split(PassChoice& passes, int length, int lanes) {
     Split best;
     const bool rows = lanes > 1;
     const auto first_cost = [&](int first, int second) {
-        const bool moved = rows && first > kOneRowStep / lanes, unaligned = rows && second % 8 != 0;
-        return passes.of(first).cost + kPerSample * first + (moved ? kMoved : 0.0) +
-               (unaligned ? kUnaligned : 0.0);
+        return passes.of(first).cost + kPerSample * first + (rows && second % 8 != 0 ? kUnaligned : 0.0);
     };
+    // Lanes and slots are exchanged on the way into a single pass, otherwise through the buffer before the next.
     const auto second_cost = [&](int second) {
         const Passes& own = passes.of(second);
-        // Lanes and slots are exchanged on the way into a single pass, otherwise through the buffer before the
-        // next.
-        const int moves = rows ? (own.radices.size() > 1 ? 1 : 0) + (second > kOneRowStep / lanes ? 1 : 0) : 0;
-        return own.cost + kPerSample * second + kMoved * moves;
+        return own.cost + kPerSample * second + (rows && own.radices.size() > 1 ? kMoved : 0.0);
     };
     const auto filled = [&](int count) { return static_cast<double>(packs_of(count, lanes)) * lanes / count; };
     for (int second = lanes; second <= length / lanes && second / 64 <= length / second; ++second) {
@@ -182,7 +175,7 @@ FftKind choose_fft(const FftGeometry& geometry, int widest) {
         }
         // The number of rows must not matter: a row has the same bits among others as alone.
         offer(FftWay::Rows, lanes, split(passes, geometry.length, lanes).cost);
-        if (fft_kernels(lanes)->short_rows)
+        if (fft_kernels(lanes)->of(FftWay::ShortRows))
             offer(FftWay::ShortRows, lanes, short_rows_cost(passes, geometry.length));
     }
     return best;
@@ -198,28 +191,24 @@ std::size_t fft_bytes(const FftKind& kind) noexcept {
 }
 
 FftTables::FftTables(const FftKind& kind) : kind_{kind}, kernels_{fft_kernels(kind.lanes)} {
-    if (kind.way == FftWay::Rows)
-        row_ = along_row();
-    else
-        lanes_ = down_lanes(kind.length, kStripPacks);
-}
-
-std::size_t FftTables::room() const noexcept {
-    const std::ptrdiff_t floats = kind_.way == FftWay::Rows
-                                      ? row_.tile + row_.lanes + std::max(row_.first.room(), row_.second.room())
-                                      : lanes_.room();
-    return static_cast<std::size_t>(floats);
+    const bool rows = kind.way == FftWay::Rows;
+    PassChoice passes;
+    int second = 1;
+    if (rows || (kind.way == FftWay::Columns && kind.length > kOneStep))
+        second = split(passes, kind.length, rows ? kind.lanes : 1).second;
+    fft_.first = take_apart(kind.length / second);
+    if (second > 1) fft_.second = take_apart(second);
+    const std::ptrdiff_t longest = std::max(fft_.first.length, second), slot = 2 * std::ptrdiff_t{kind.lanes};
+    fft_.work = 2 * longest * slot;
+    fft_.stage = rows ? 0 : longest * slot * (second > 1 ? kStripPacks : 1);
+    if (rows)
+        lay_out_rows();
+    else if (second > 1)
+        lay_out_columns();
 }
 
 void FftTables::run(const float* in, float* out, std::ptrdiff_t pitch, int count, float* room) const noexcept {
-    switch (kind_.way) {
-        case FftWay::Columns:
-            return kernels_->columns(lanes_, {in, out, pitch, count}, room);
-        case FftWay::Rows:
-            return kernels_->rows(row_, {in, out, pitch, count}, room);
-        case FftWay::ShortRows:
-            return kernels_->short_rows(lanes_, {in, out, pitch, count}, room);
-    }
+    kernels_->of(kind_.way)(fft_, {in, out, pitch, count}, room);
 }
 
 const FftRoot* FftTables::keep(std::vector<FftRoot> roots) { return roots_.emplace_back(std::move(roots)).data(); }
@@ -245,72 +234,41 @@ ShortFft FftTables::take_apart(int length) {
     return fft;
 }
 
-LaneFft FftTables::down_lanes(int length, int packs) {
-    LaneFft fft;
-    const std::ptrdiff_t slot = 2 * std::ptrdiff_t{kind_.lanes};
-    const int most = kind_.way == FftWay::Rows ? kOneRowStep / kind_.lanes : kOneStep;
-    if (length <= most || kind_.way == FftWay::ShortRows) {
-        fft.first = take_apart(length);
-        fft.stage = length * slot;
-        fft.work = 2 * fft.stage;
-        return fft;
-    }
-    PassChoice passes;
-    const int second = split(passes, length, 1).second, first = length / second;
-    fft.first = take_apart(first);
-    fft.second = take_apart(second);
-    const Roots root{length, kind_.forward};
+void FftTables::lay_out_columns() {
+    const int first = fft_.first.length, second = fft_.second.length;
+    const Roots root{kind_.length, kind_.forward};
     std::vector<FftRoot> outer;
     for (std::int64_t i = 0; i < second; ++i)
         for (int k = 0; k < first; ++k) outer.push_back(root(i * result_of(k, first, kind_.forward)));
-    fft.outer = keep(std::move(outer));
-
-    fft.pitch = second | 1;  // an even one would have slots share a few lines of the cache
-    fft.work = 2 * std::max(first, second) * slot;
-    fft.stage = std::max(first, second) * slot * packs;
-    fft.tile = first * fft.pitch * slot * packs;
-    return fft;
+    fft_.outer = keep(std::move(outer));
+    fft_.pitch = second | 1;  // an even one would have slots share a few lines of the cache
+    fft_.tile = first * fft_.pitch * 2 * kind_.lanes * kStripPacks;
 }
 
-RowFft FftTables::along_row() {
-    PassChoice passes;
-    RowFft row;
-    const int second = split(passes, kind_.length, kind_.lanes).second, first = kind_.length / second;
-    const std::ptrdiff_t slot = 2 * std::ptrdiff_t{kind_.lanes};
-    row.first = down_lanes(first, kStripPacks);
-    row.second = down_lanes(second, kStripPacks);
-    row.pitch = 16 * (second / 8 | 1) + (second % 8 != 0 ? 32 : 0);  // whole lines of the cache, an odd number
-    row.tile = first * row.pitch;
-    turn_lanes(row);
-    row.lanes = std::max(row.second.two_steps() ? second : 0, row.packs ? first : 0) * kStripPacks * slot;
-    return row;
-}
-
-void FftTables::turn_lanes(RowFft& row) {
-    const int first = row.first.length(), second = row.second.length(), lanes = kind_.lanes;
-    const int packs = packs_of(second, lanes), hop = row.first.two_steps() ? row.first.first.length : 1;
+void FftTables::lay_out_rows() {
+    const int first = fft_.first.length, second = fft_.second.length, lanes = kind_.lanes;
+    fft_.pitch = 16 * (second / 8 | 1) + (second % 8 != 0 ? 32 : 0);  // whole lines of the cache, an odd number
+    fft_.tile = first * fft_.pitch;
     const Roots root{kind_.length, kind_.forward};
-    const auto result = [&](int k) {
-        return k % hop + std::int64_t{hop} * result_of(k / hop, first / hop, kind_.forward);
-    };
-    const int whole = kind_.length < kLongRow ? packs : 1;
-    turns_.reserve(static_cast<std::size_t>(whole) * static_cast<std::size_t>(first) * 2 *
-                   static_cast<std::size_t>(lanes));
-    for (int b = 0; b < whole; ++b)
-        for (int k = 0; k < first; ++k)
-            for (const auto part : {&FftRoot::re, &FftRoot::im})
-                for (int i = 0; i < lanes; ++i)
-                    turns_.push_back(root(result(k) * (lane_of(b, lanes, second) + i)).*part);
-    row.turns = turns_.data();
-    if (whole == packs) return;
-    std::vector<FftRoot> of_packs;
+    const int packs = packs_of(second, lanes);
+    turned_ =
+        static_cast<std::size_t>(packs) * static_cast<std::size_t>(first) * static_cast<std::size_t>(lanes) * 2;
+    turns_ = allocate_floats(turned_);
+    if (!turns_) throw std::bad_alloc{};
+    fft_.turns = turns_.get();
+    float* to = turns_.get();
     for (int b = 0; b < packs; ++b)
-        for (int k = 0; k < first; ++k) of_packs.push_back(root(result(k) * lane_of(b, lanes, second)));
-    row.packs = keep(std::move(of_packs));
+        for (int k = 0; k < first; ++k, to += 2 * lanes)
+            for (int i = 0; i < lanes; ++i) {
+                const std::int64_t result = result_of(k, first, kind_.forward);
+                const FftRoot turn = root(result * (lane_of(b, lanes, second) + i));
+                to[i] = turn.re;
+                to[lanes + i] = turn.im;
+            }
 }
 
 std::size_t FftTables::bytes() const noexcept {
-    std::size_t floats = room() + turns_.size();
+    std::size_t floats = room() + turned_;
     for (const auto& roots : roots_) floats += roots.size() * (sizeof(FftRoot) / sizeof(float));
     return floats * sizeof(float);
 }

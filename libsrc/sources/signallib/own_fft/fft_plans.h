@@ -2,17 +2,15 @@
 #ifndef QUO_FFT_PLANS_H
 #define QUO_FFT_PLANS_H
 
+#include <compare>
 #include <cstddef>
-#include <cstdint>
-#include <tuple>
 #include <vector>
 
 #include "signallib/fft_engine.h"
 #include "signallib/own_fft/fft_kernels.h"
+#include "signallib/spare_floats.h"
 
 namespace quo {
-
-enum class FftWay : std::uint8_t { Columns, Rows, ShortRows };
 
 /** What tables are made for. */
 struct FftKind {
@@ -21,9 +19,7 @@ struct FftKind {
     bool forward = true;
     int lanes = 4;
 
-    friend bool operator<(const FftKind& a, const FftKind& b) {
-        return std::tie(a.way, a.length, a.forward, a.lanes) < std::tie(b.way, b.length, b.forward, b.lanes);
-    }
+    auto operator<=>(const FftKind&) const = default;
 };
 
 /** Whether a length has no prime factor above 7. */
@@ -41,7 +37,7 @@ public:
     FftTables& operator=(const FftTables&) = delete;
 
     /** Floats that a run works in. */
-    [[nodiscard]] std::size_t room() const noexcept;
+    [[nodiscard]] std::size_t room() const noexcept { return static_cast<std::size_t>(fft_.room()); }
     /** Bytes of the tables and of that room. */
     [[nodiscard]] std::size_t bytes() const noexcept;
     /** Transforms `count` rows or columns; `pitch` floats lie between rows of the image. */
@@ -50,16 +46,15 @@ public:
 private:
     [[nodiscard]] const FftRoot* keep(std::vector<FftRoot> roots);
     [[nodiscard]] ShortFft take_apart(int length);
-    [[nodiscard]] LaneFft down_lanes(int length, int packs);
-    [[nodiscard]] RowFft along_row();
-    void turn_lanes(RowFft& row);
+    void lay_out_rows();
+    void lay_out_columns();
 
     FftKind kind_;
     const FftKernels* kernels_;
     std::vector<std::vector<FftRoot>> roots_;
-    std::vector<float> turns_;
-    LaneFft lanes_;
-    RowFft row_;
+    Floats turns_;            ///< in whole lines of the cache: half of all loads would cross them otherwise
+    std::size_t turned_ = 0;  ///< floats of them
+    FftSteps fft_;
 };
 
 /** Bytes that the tables and the room of one run take. */

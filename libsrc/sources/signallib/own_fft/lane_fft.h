@@ -2,6 +2,7 @@
 #ifndef QUO_LANE_FFT_H
 #define QUO_LANE_FFT_H
 
+#include <algorithm>
 #include <array>
 #include <cstddef>
 #include <cstring>
@@ -57,10 +58,20 @@ struct LaneFfts {
     }
     QUO_FFT_INLINE C add(C a, C b) { return {a.re + b.re, a.im + b.im}; }
     QUO_FFT_INLINE C subtract(C a, C b) { return {a.re - b.re, a.im - b.im}; }
-    template <class Root>
-    QUO_FFT_INLINE C turn(C a, const Root& by) {
-        const V re = by.re - V{}, im = by.im - V{};  // not 0 +, which would be computed: it turns -0 into 0
-        return {fused(-a.im, im, a.re * re), fused(a.im, re, a.re * im)};
+    QUO_FFT_INLINE C turn(C a, C by) {
+        return {fused(-a.im, by.im, a.re * by.re), fused(a.im, by.re, a.re * by.im)};
+    }
+    /** One root in all lanes. */
+    QUO_FFT_INLINE C spread(FftRoot root) {
+        return {root.re - V{}, root.im - V{}};  // not 0 +, which would be computed: it turns -0 into 0
+    }
+    /** In registers from here on: the compiler would rather read what is used twice from memory twice, though
+     * each butterfly waits for its loads already. */
+    QUO_FFT_INLINE C held(C c) {
+#if defined(__x86_64__)
+        asm("" : "+v"(c.re), "+v"(c.im));
+#endif
+        return c;
     }
     /** Turned by exp(-2 pi i K / N). */
     template <int K, int N>
@@ -74,7 +85,7 @@ struct LaneFfts {
         if constexpr (kEighths == 6) return {-a.im, a.re};
         if constexpr (kEighths == 1 || kEighths == 5) return {(a.re + a.im) * kRe, (a.im - a.re) * kRe};
         if constexpr (kEighths == 3 || kEighths == 7) return {(a.re - a.im) * kRe, (a.re + a.im) * kRe};
-        return turn(a, FftRoot{kRe, kIm});
+        return turn(a, spread({kRe, kIm}));
     }
 
     // --- Slots
@@ -180,12 +191,10 @@ struct LaneFfts {
     // --- Passes
     // --------------------------------------------------------------------------------------------------
 
-    /** What results are turned by, if anything: all lanes by one root, or each by its own, from slots `lanes_step`
-     * apart. */
+    /** What results are turned by, if anything: all lanes by one root, or each by its own, in slots. */
     struct Outer {
         const FftRoot* roots = nullptr;
         const float* lanes = nullptr;
-        std::ptrdiff_t lanes_step = kSlot;
     };
     /** A pass from slots `in_step` apart to slots `out_step` apart. `zero` takes result 0. */
     struct Route {
@@ -194,32 +203,46 @@ struct LaneFfts {
         std::ptrdiff_t in_step, out_step = kSlot;
         Outer outer{};
         float sign = 1.0F;  ///< of imaginary parts that become lanes or come from them
+        int many = W;       ///< rows or columns that one pass is all of
     };
     enum Turns { kNone, kInner, kOuter, kLanes };
+
+    template <bool Interleaved, int R>
+    QUO_FFT_INLINE void save_all(const C (&x)[R], float* to, float* zero, std::ptrdiff_t hop) {
+        save<Interleaved>(x[0], zero);
+        each<R - 1>([&](auto k) QUO_FFT_HERE { save<Interleaved>(x[k + 1], to + (k + 1) * hop); });
+    }
 
     template <int R, bool InInterleaved, bool OutInterleaved, Turns T>
     static void pass(const FftPass& pass, const Route& route) {
         const std::ptrdiff_t in_hop = pass.count * pass.stride * route.in_step;
         const std::ptrdiff_t out_hop = pass.stride * route.out_step;
-        const std::ptrdiff_t lanes_step = route.outer.lanes_step, lanes_hop = pass.stride * lanes_step;
         const FftRoot* roots = T == kOuter ? route.outer.roots : pass.roots;
+        // Columns that one pass is all of: their packs lie side by side.
+        constexpr bool kPacks = InInterleaved && T == kNone;
+        const int some = kPacks ? route.many / W : pass.stride;
+        const std::ptrdiff_t in_next = kPacks ? kSlot : route.in_step, out_next = kPacks ? kSlot : route.out_step;
         for (int p = 0; p < pass.count; ++p) {
             const float* from = route.in + std::ptrdiff_t{p} * pass.stride * route.in_step;
             float* to = route.out + std::ptrdiff_t{p} * R * out_hop;
-            for (int q = 0; q < pass.stride; ++q, from += route.in_step, to += route.out_step) {
+            for (int q = 0; q < some; ++q, from += in_next, to += out_next) {
                 C x[R];
-                each<R>([&](auto j) QUO_FFT_HERE { x[j] = load<InInterleaved>(from + j * in_hop); });
+                each<R>([&](auto j) QUO_FFT_HERE {
+                    x[j] = load<InInterleaved>(from + j * in_hop);
+                    if constexpr (Level == ProcessorLevel::kAvx512 && R <= 8) x[j] = held(x[j]);
+                });
                 butterfly<R>(x);
                 if constexpr (T == kInner)
-                    each<R - 1>([&](auto k) QUO_FFT_HERE { x[k + 1] = turn(x[k + 1], roots[k]); });
+                    each<R - 1>([&](auto k) QUO_FFT_HERE { x[k + 1] = turn(x[k + 1], held(spread(roots[k]))); });
                 if constexpr (T == kOuter)
-                    each<R>([&](auto k) QUO_FFT_HERE { x[k] = turn(x[k], roots[q + k * pass.stride]); });
+                    each<R>([&](auto k)
+                                QUO_FFT_HERE { x[k] = turn(x[k], held(spread(roots[q + k * pass.stride]))); });
                 if constexpr (T == kLanes)
                     each<R>([&](auto k) QUO_FFT_HERE {
-                        x[k] = turn(x[k], load<false>(route.outer.lanes + q * lanes_step + k * lanes_hop));
+                        x[k] = turn(x[k], held(load<false>(route.outer.lanes + (q + k * pass.stride) * kSlot)));
                     });
-                save<OutInterleaved>(x[0], T != kInner && q == 0 ? route.zero : to);
-                each<R - 1>([&](auto k) QUO_FFT_HERE { save<OutInterleaved>(x[k + 1], to + (k + 1) * out_hop); });
+                float* const zero = kPacks ? route.zero + q * kSlot : T != kInner && q == 0 ? route.zero : to;
+                save_all<OutInterleaved>(x, to, zero, out_hop);
             }
             if constexpr (T == kInner) roots += R - 1;
         }
@@ -257,20 +280,21 @@ struct LaneFfts {
         return in == kInterleaved ? find<true, false, kInner>(radix) : find<false, false, kInner>(radix);
     }
     static PassKernel last_pass(int radix, Form in, Form out, const Outer& outer) {
-        if (in == kAcross) return row_kernels(radix).across;
+        if (in == kAcross) return out == kAcross ? row_kernels(radix).whole : row_kernels(radix).across;
         const bool apart = in == kSplit;
         if (out == kAcross) return row_kernels(radix).out;
         if (outer.lanes) return apart ? find<false, true, kLanes>(radix) : find<true, true, kLanes>(radix);
         if (outer.roots) return apart ? find<false, false, kOuter>(radix) : find<true, false, kOuter>(radix);
         return apart ? find<false, true, kNone>(radix) : find<true, true, kNone>(radix);
     }
-    /** `work` holds the transform twice. Backward transforms are forward ones whose results stand in the opposite
-     * order, or the conjugate ones of conjugate rows. */
-    static void run(const ShortFft& fft, From in, To out, Outer outer, float* work) {
+    /** `many` of them, if one pass is all; `work` holds the transform twice. Backward transforms are forward ones
+     * whose results stand in the opposite order, or the conjugate ones of conjugate rows. */
+    static void run(const ShortFft& fft, From in, To out, Outer outer, float* work, int many = W) {
         const int last = fft.passes - 1;
         Route route{in.at, work, work, in.step, kSlot, outer};
         const bool conjugate = fft.backward && out.form == kAcross;
         if (conjugate) route.sign = -1.0F;
+        route.many = many;
         for (int k = 0; k < last; ++k) {
             float* const next = route.out == work ? work + fft.length * kSlot : work;
             first_pass(fft.pass[k].radix, k == 0 ? in.form : kSplit)(fft.pass[k], route);
@@ -318,62 +342,49 @@ struct LaneFfts {
         }
     }
 
-    /** `packs` packs of columns in two steps, those that are split one behind the other. Interleaved slots pass
-     * through a stage of `floats` floats a row. */
-    static void two_steps(const LaneFft& fft, From in, To out, int packs, std::ptrdiff_t floats,
-                          const float* turns, float* room) {
-        const int n1 = fft.second.length, n2 = fft.first.length;
-        const std::ptrdiff_t pack = fft.length() * kSlot;
-        float *const work = room, *const stage = work + fft.work, *const tile = stage + fft.stage;
+    /** So many columns in two steps, a pack of those that are split behind the other: through a stage whose rows
+     * lie close together. */
+    static void two_steps(const FftSteps& fft, const FftImage& columns, float* room) {
+        const int n1 = fft.second.length, n2 = fft.first.length, packs = (columns.count + W - 1) / W;
+        const std::ptrdiff_t step = columns.step, floats = 2 * std::ptrdiff_t{columns.count};
         const std::ptrdiff_t stage_step = packs * kSlot, tile_row = packs * fft.pitch * kSlot;
+        float *const work = room, *const stage = work + fft.work, *const tile = stage + fft.stage;
         for (int i = 0; i < n1; ++i) {
-            if (in.form == kInterleaved) {
-                move(in.at + i * in.step, n1 * in.step, stage, stage_step, n2, floats);
-                if (i + 1 < n1) ask_first(in.at + (i + 1) * in.step, n1 * in.step, n2, floats);
-            }
-            for (int b = 0; b < packs; ++b) {
-                const From from = in.form == kInterleaved
-                                      ? From{stage + b * kSlot, stage_step, kInterleaved}
-                                      : From{in.at + b * pack + i * in.step, n1 * in.step, kSplit};
-                run(fft.first, from, {tile + (b * fft.pitch + i) * kSlot, tile_row, kSplit},
-                    {fft.outer + std::ptrdiff_t{i} * n2}, work);
-            }
+            const float* const in = columns.in + i * step;
+            move(in, n1 * step, stage, stage_step, n2, floats);
+            if (i + 1 < n1) ask_first(in + step, n1 * step, n2, floats);
+            for (int b = 0; b < packs; ++b)
+                run(fft.first, {stage + b * kSlot, stage_step, kInterleaved},
+                    {tile + (b * fft.pitch + i) * kSlot, tile_row, kSplit}, {fft.outer + std::ptrdiff_t{i} * n2},
+                    work);
         }
         for (int k = 0; k < n2; ++k) {
-            ask_first(out.at + k * out.step, n2 * out.step, n1, floats);
+            float* const out = columns.out + k * step;
+            ask_first(out, n2 * step, n1, floats);
             for (int b = 0; b < packs; ++b)
                 run(fft.second, {tile + (k * packs + b) * fft.pitch * kSlot, kSlot, kSplit},
-                    {stage + b * kSlot, stage_step, kInterleaved},
-                    {nullptr, turns ? turns + b * pack + k * kSlot : nullptr, n2 * kSlot}, work);
-            move(stage, stage_step, out.at + k * out.step, n2 * out.step, n1, floats);
+                    {stage + b * kSlot, stage_step, kInterleaved}, {}, work);
+            move(stage, stage_step, out, n2 * step, n1, floats);
         }
     }
-    /** Whole packs: more than one in two steps only. */
-    static void whole_packs(const LaneFft& fft, From in, To out, int packs, const float* turns, float* room) {
-        if (fft.two_steps()) return two_steps(fft, in, out, packs, packs * kSlot, turns, room);
-        run(fft.first, in, out, {nullptr, turns}, room);
-    }
-    /** Columns that fill no pack. */
-    static void part_pack(const LaneFft& fft, From in, To out, std::ptrdiff_t floats, float* room) {
+    /** Whole packs, of which more than one are a single pass; or no more columns than lanes. */
+    static void one_step(const FftSteps& fft, const FftImage& columns, float* room) {
+        const std::ptrdiff_t step = columns.step, floats = 2 * std::ptrdiff_t{columns.count};
+        if (columns.count % W == 0)
+            return run(fft.first, {columns.in, step, kInterleaved}, {columns.out, step, kInterleaved}, {}, room,
+                       columns.count);
         float* const stage = room + fft.work;
-        move(in.at, in.step, stage, kSlot, fft.first.length, floats);
+        move(columns.in, step, stage, kSlot, fft.first.length, floats);
         run(fft.first, {stage, kSlot, kInterleaved}, {stage, kSlot, kInterleaved}, {}, room);
-        move(stage, kSlot, out.at, out.step, fft.first.length, floats);
+        move(stage, kSlot, columns.out, step, fft.first.length, floats);
     }
-
-    static void columns(const LaneFft& fft, const FftColumns& columns, float* room) noexcept {
-        const int width = fft.two_steps() ? kStripPacks * W : W;
-        for (int c = 0; c < columns.count; c += width) {
-            const int some = columns.count - c < width ? columns.count - c : width;
-            const From in{columns.in + 2 * std::ptrdiff_t{c}, columns.step, kInterleaved};
-            const To out{columns.out + 2 * std::ptrdiff_t{c}, columns.step, kInterleaved};
-            const std::ptrdiff_t floats = 2 * std::ptrdiff_t{some};
-            if (fft.two_steps())
-                two_steps(fft, in, out, (some + W - 1) / W, floats, nullptr, room);
-            else if (some == W)
-                whole_packs(fft, in, out, 1, nullptr, room);
-            else
-                part_pack(fft, in, out, floats, room);
+    static void columns(const FftSteps& fft, const FftImage& columns, float* room) noexcept {
+        const bool whole = !fft.two() && fft.first.passes == 1 && columns.count > W;
+        const int width = whole ? columns.count / W * W : fft.two() ? kStripPacks * W : W;
+        for (std::ptrdiff_t c = 0; c < columns.count; c += width) {
+            const int left = columns.count - static_cast<int>(c);
+            (fft.two() ? two_steps : one_step)(
+                fft, {columns.in + 2 * c, columns.out + 2 * c, columns.step, left < width ? left : width}, room);
         }
     }
 
@@ -425,61 +436,37 @@ struct LaneFfts {
     /** First of a pack's lanes: the last pack overlaps the one before it. */
     QUO_FFT_INLINE int lane_of(int pack, int count) { return (pack + 1) * W <= count ? pack * W : count - W; }
 
-    /** Packs that are moved together from the one that begins at `lane`. */
-    QUO_FFT_INLINE int strip_of(const LaneFft& fft, int lane, int count) {
-        return fft.two_steps() && lane + kStripPacks * W <= count ? kStripPacks : 1;
-    }
-    /** What the results of some packs are turned by, in `room` if they are not kept. */
-    static const float* turns_of(const RowFft& fft, int pack, int packs, float* room) {
-        const int n2 = fft.first.length();
-        const std::ptrdiff_t at = std::ptrdiff_t{pack} * n2;
-        if (!fft.packs) return fft.turns + at * kSlot;
-        for (int k = 0; k < packs * n2; ++k)
-            save<false>(turn(load<false>(fft.turns + k % n2 * kSlot), fft.packs[at + k]), room + k * kSlot);
-        return room;
-    }
     /** Step 1: what it leaves is a row of the tile for each of its results. The `next` row is asked for on the
      * way, into the second cache: all at once it would keep what this one needs waiting. */
-    static void across_samples(const RowFft& fft, const float* in, const float* next, float* tile, float* room) {
+    static void across_samples(const FftSteps& fft, const float* in, const float* next, float* tile, float* room) {
         constexpr std::ptrdiff_t kMostAsked = 1 << 15;
-        const int n1 = fft.second.length();
-        const std::ptrdiff_t share = fft.first.length() * kSlot;
-        for (int b = 0, packs = 0; b * W < n1; b += packs) {
+        const int n1 = fft.second.length;
+        const std::ptrdiff_t share = fft.first.length * kSlot;
+        for (int b = 0; b * W < n1; ++b) {
             const int lane = lane_of(b, n1);
-            packs = strip_of(fft.first, lane, n1);
-            if (b * share < kMostAsked) ask<2>(next + b * share, packs * share);
-            whole_packs(fft.first, {in + 2 * lane, 2 * std::ptrdiff_t{n1}, kInterleaved},
-                        {tile + 2 * lane, fft.pitch, kInterleaved}, packs, turns_of(fft, b, packs, room),
-                        room + fft.lanes);
+            if (b * share < kMostAsked) ask<2>(next + b * share, share);
+            run(fft.first, {in + 2 * lane, 2 * std::ptrdiff_t{n1}, kInterleaved},
+                {tile + 2 * lane, fft.pitch, kInterleaved}, {nullptr, fft.turns + b * share}, room);
         }
     }
     /** Step 2: W rows of the tile are the lanes. */
-    static void across_results(const RowFft& fft, const float* tile, float* out, float* room) {
-        const int n1 = fft.second.length(), n2 = fft.first.length();
+    static void across_results(const FftSteps& fft, const float* tile, float* out, float* room) {
+        const int n2 = fft.first.length;
         const std::ptrdiff_t step = 2 * std::ptrdiff_t{n2};
-        if (!fft.second.two_steps() && fft.second.first.passes == 1)
-            return run(fft.second.first, {tile, fft.pitch, kAcross}, {out, step, kInterleaved}, {}, room);
-        float *const lanes = room, *const rest = room + fft.lanes;
-        for (int c = 0, packs = 0; c * W < n2; c += packs) {
+        if (fft.second.passes == 1)
+            return run(fft.second, {tile, fft.pitch, kAcross}, {out, step, kInterleaved}, {}, room, n2);
+        for (int c = 0; c * W < n2; ++c) {
             const int result = lane_of(c, n2);
-            packs = strip_of(fft.second, result, n2);
-            From from{tile + result * fft.pitch, fft.pitch, kAcross};
-            if (fft.second.two_steps()) {
-                for (int b = 0; b < packs; ++b, from.at += W * from.step) {
-                    float* const to = lanes + b * std::ptrdiff_t{n1} * kSlot;
-                    row_kernels(1).in({1, n1, 1, nullptr}, {from.at, to, to, from.step});
-                }
-                from = {lanes, kSlot, kSplit};
-            }
-            whole_packs(fft.second, from, {out + 2 * result, step, kInterleaved}, packs, nullptr, rest);
+            run(fft.second, {tile + result * fft.pitch, fft.pitch, kAcross},
+                {out + 2 * result, step, kInterleaved}, {}, room);
         }
     }
-    static void rows(const RowFft& fft, const FftRows& rows, float* room) noexcept {
+    static void rows(const FftSteps& fft, const FftImage& rows, float* room) noexcept {
         float* const rest = room + fft.tile;
         for (std::ptrdiff_t row = 0; row < rows.count; ++row) {
-            const float* const in = rows.in + row * rows.distance;
-            across_samples(fft, in, row + 1 < rows.count ? in + rows.distance : in, room, rest);
-            across_results(fft, room, rows.out + row * rows.distance, rest);
+            const float* const in = rows.in + row * rows.step;
+            across_samples(fft, in, row + 1 < rows.count ? in + rows.step : in, room, rest);
+            across_results(fft, room, rows.out + row * rows.step, rest);
         }
     }
 
@@ -514,38 +501,33 @@ struct LaneFfts {
             load_two(from + 2 * at, gap, x[at], x[at + 1]);
         });
     }
-    /** `packs` times W rows whose samples registers hold. */
-    template <int N>
-    static void tiny_rows(const float* in, float* out, const Gap& gap, int packs) {
-        for (int pack = 0; pack < packs; ++pack, in += W * gap.step, out += W * gap.step) {
+    /** Rows whose samples registers hold: they become rows again, or slots, so many that these lie side by side.
+     */
+    template <int N, bool RowsAgain>
+    static void whole_rows(const FftPass& /*pass*/, const Route& route) {
+        const Gap in{route.in_step, route.sign}, out{route.out_step, route.sign};
+        const std::ptrdiff_t out_row = RowsAgain ? out.step : 2;
+        const int rows = route.many;
+        const float* from = route.in;
+        float* to = route.out;
+        for (int row = 0, hop = 0; row < rows; row += hop, from += hop * in.step, to += hop * out_row) {
+            const int left = rows - row - W;
+            hop = left == 0 || left >= W ? W : left;  // the last pack overlaps the one before it
             if constexpr (N == 1) {
-                each<W>([&](auto row) QUO_FFT_HERE {
-                    std::memcpy(out + row * gap.step, in + row * gap.step, sizeof(FftRoot));
-                });
+                each<W>([&](auto i)
+                            QUO_FFT_HERE { std::memcpy(to + i * out.step, from + i * in.step, sizeof(FftRoot)); });
             } else {
                 C x[N];
-                load_rows(in, gap, x);
+                load_rows(from, in, x);
                 butterfly<N>(x);
-                each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
-                    constexpr int at = pair_of(2 * i, N);
-                    save_two(x[at], x[at + 1], out + 2 * at, gap);
-                });
+                if constexpr (RowsAgain)
+                    each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
+                        constexpr int at = pair_of(2 * i, N);
+                        save_two(x[at], x[at + 1], to + 2 * at, out);
+                    });
+                else
+                    save_all<true>(x, to, route.zero + 2 * row, out.step);
             }
-        }
-    }
-    /** Rows whose samples registers hold become slots: so many that their slots lie side by side. */
-    template <int N>
-    static void pass_across(const FftPass& /*pass*/, const Route& route) {
-        const auto rows = static_cast<int>((route.out_step < 0 ? -route.out_step : route.out_step) / 2);
-        for (int c = 0; c * W < rows; ++c) {
-            const int row = lane_of(c, rows);
-            C x[N];
-            load_rows(route.in + row * route.in_step, {route.in_step, 1.0F}, x);
-            butterfly<N>(x);
-            save<true>(x[0], route.zero + 2 * row);
-            each<N - 1>([&](auto k) QUO_FFT_HERE {
-                save<true>(x[k + 1], route.out + 2 * row + (k + 1) * route.out_step);
-            });
         }
     }
     /** The first pass over W rows, which become slots. */
@@ -562,8 +544,9 @@ struct LaneFfts {
                 float* const to = route.out + (at + i) * R * kSlot;
                 butterfly<R>(x[i]);
                 save<false>(x[i][0], to);
-                each<R - 1>([&](auto k)
-                                QUO_FFT_HERE { save<false>(turn(x[i][k + 1], roots[k]), to + (k + 1) * kSlot); });
+                each<R - 1>([&](auto k) QUO_FFT_HERE {
+                    save<false>(turn(x[i][k + 1], held(spread(roots[k]))), to + (k + 1) * kSlot);
+                });
             });
         }
     }
@@ -584,53 +567,46 @@ struct LaneFfts {
                         QUO_FFT_HERE { save_two(x[0][k], x[1][k], route.out + 2 * (at + k * pass.stride), gap); });
         }
     }
-    /** Rows that are transformed across have a sample for every lane at least. */
-    template <int R>
-    static constexpr PassKernel across_of() {
-        if constexpr (R >= W) return pass_across<R>;
-        return nullptr;
-    }
     struct RowKernels {
-        void (*tiny)(const float*, float*, const Gap&, int) = nullptr;
-        PassKernel in = nullptr, out = nullptr, across = nullptr;
+        PassKernel whole = nullptr, in = nullptr, out = nullptr, across = nullptr;
     };
     template <int... R>
     static constexpr std::array<RowKernels, kRadices> row_table(std::integer_sequence<int, R...> /*radices*/) {
         std::array<RowKernels, kRadices> table{};
-        ((table[R].in = pass_in<R>), ...);
-        ((table[R].across = across_of<R>()), ...);
-        if constexpr (kShortRows) ((table[R].tiny = tiny_rows<R>, table[R].out = pass_out<R>), ...);
+        // Rows that are transformed across have a sample for every lane at least.
+        ((table[R].in = pass_in<R>, table[R].across = whole_rows<std::max(R, W), false>), ...);
+        if constexpr (kShortRows) ((table[R].whole = whole_rows<R, true>, table[R].out = pass_out<R>), ...);
         return table;
     }
     static const RowKernels& row_kernels(int radix) {
         static constexpr auto kTable = row_table(Radices{});
         return kTable[static_cast<std::size_t>(radix)];
     }
-    /** `packs` times W rows. */
-    static void row_packs(const ShortFft& fft, FftRows rows, const Gap& gap, int packs, float* work) {
-        if (fft.passes == 1) return row_kernels(fft.pass[0].radix).tiny(rows.in, rows.out, gap, packs);
-        for (; packs > 0; --packs, rows.in += W * gap.step, rows.out += W * gap.step)
-            run(fft, {rows.in, gap.step, kAcross}, {rows.out, gap.step, kAcross}, {}, work);
+    /** Packs of W rows. */
+    static void row_packs(const ShortFft& fft, const FftImage& rows, float* work) {
+        const int together = fft.passes == 1 ? rows.count : W;
+        for (std::ptrdiff_t row = 0; row < rows.count; row += together)
+            run(fft, {rows.in + row * rows.step, rows.step, kAcross},
+                {rows.out + row * rows.step, rows.step, kAcross}, {}, work, together);
     }
-    static void short_rows(const LaneFft& fft, const FftRows& rows, float* room) noexcept {
-        const std::ptrdiff_t floats = 2 * std::ptrdiff_t{fft.first.length}, step = rows.distance;
+    static void short_rows(const FftSteps& fft, const FftImage& rows, float* room) noexcept {
+        const std::ptrdiff_t floats = 2 * std::ptrdiff_t{fft.first.length}, step = rows.step;
         const std::size_t bytes = sizeof(float) * static_cast<std::size_t>(floats);
-        const float sign = fft.first.backward ? -1.0F : 1.0F;
-        row_packs(fft.first, rows, {step, sign}, rows.count / W, room);
         const int rest = rows.count % W, whole = rows.count - rest;
+        row_packs(fft.first, {rows.in, rows.out, step, whole}, room);
         if (rest == 0) return;
         // The lanes that are left over repeat others.
         float* const stage = room + fft.work;
         for (int row = 0; row < W; ++row)
             std::memcpy(stage + row * floats, rows.in + (whole + row % rest) * step, bytes);
-        row_packs(fft.first, {stage, stage, floats, W}, {floats, sign}, 1, room);
+        row_packs(fft.first, {stage, stage, floats, W}, room);
         for (int row = 0; row < rest; ++row)
             std::memcpy(rows.out + (whole + row) * step, stage + row * floats, bytes);
     }
 
     static constexpr FftKernels kernels() {
-        if constexpr (kShortRows) return {W, columns, rows, short_rows};
-        return {W, columns, rows, nullptr};
+        if constexpr (kShortRows) return {{columns, rows, short_rows}};
+        return {{columns, rows, nullptr}};
     }
 #undef QUO_FFT_HERE
 #undef QUO_FFT_INLINE
