@@ -229,7 +229,8 @@ struct LaneFfts {
                 C x[R];
                 each<R>([&](auto j) QUO_FFT_HERE {
                     x[j] = load<InInterleaved>(from + j * in_hop);
-                    if constexpr (Level == ProcessorLevel::kAvx512 && R <= 8) x[j] = held(x[j]);
+                    constexpr bool kFits = Level == ProcessorLevel::kAvx512 && R <= 8;
+                    if constexpr (kFits && !InInterleaved) x[j] = held(x[j]);
                 });
                 butterfly<R>(x);
                 if constexpr (T == kInner)
