@@ -126,7 +126,8 @@ void Record::copy_values(const Record& from, std::size_t row) const {
 
 int Record::copy(const Record& from) const {
     if (&from.object_ == &object_) return QUO_OK;
-    if (object_.table_refused_ || from.object_.table_refused_) return QUO_NO_MEMORY;  // arrays are found by it
+    const bool unlisted = object_.table_refused_ || from.object_.table_refused_;
+    if (unlisted && has_arrays()) return QUO_NO_MEMORY;  // they are found by the list
     if (has_arrays()) object_.destroyBuffers();
     bool allocates = false;
     for (std::size_t i = 0; i < fields_.size(); ++i) {
