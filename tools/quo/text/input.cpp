@@ -2,6 +2,7 @@
 #include "input.h"
 
 #include <fcntl.h>
+#include <poll.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -17,6 +18,7 @@ namespace {
 constexpr std::size_t kBlock = 1 << 16;
 constexpr std::size_t kLongestLine = 1 << 20;
 constexpr std::size_t kMostOfLines = 4 * kLongestLine;  // that are given out together
+constexpr int kLookForSignals_ms = 50;
 
 }  // namespace
 
@@ -34,10 +36,20 @@ LineReader::~LineReader() {
     if (owned_) close(descriptor_);
 }
 
+// A signal may have gone to another thread, or have come just before the wait: that does not end it.
+void LineReader::wait_for_input() const {
+    pollfd input{.fd = descriptor_, .events = POLLIN, .revents = 0};
+    int ready = 0;
+    do {
+        throw_if_interrupted();
+        ready = poll(&input, 1, kLookForSignals_ms);
+    } while (ready == 0 || (ready < 0 && errno == EINTR));
+}
+
 std::size_t LineReader::read_some(char* to, std::size_t room) {
     ssize_t got = 0;
     do {
-        throw_if_interrupted();
+        wait_for_input();
         got = read(descriptor_, to, room);
     } while (got < 0 && errno == EINTR);
     if (got < 0) throw Failure(name_ + ": " + system_cause());

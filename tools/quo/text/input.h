@@ -34,6 +34,8 @@ public:
     std::int64_t bytes_in_all() const { return bytes_in_all_; }
 
 private:
+    /** Returns once there is something to read, or nothing more will come. */
+    void wait_for_input() const;
     /** Bytes that were put to `to`; 0 at the end. */
     std::size_t read_some(char* to, std::size_t room);
     bool refill();
