@@ -22,7 +22,7 @@ quo_install_licences(${CMAKE_INSTALL_DOCDIR}/licences COMPONENT runtime)
 install(FILES "${PROJECT_SOURCE_DIR}/README.md" "${PROJECT_SOURCE_DIR}/CHANGELOG.md" DESTINATION ${CMAKE_INSTALL_DOCDIR})
 # What builds the examples within the project stays behind; examples/chain builds by itself.
 install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples" DESTINATION ${CMAKE_INSTALL_DOCDIR}
-        REGEX "/examples/(CMakeLists.txt|quoted.cmake)$" EXCLUDE)
+        REGEX "/examples/(CMakeLists.txt|quoted.cmake)$|/__pycache__$" EXCLUDE)
 install(DIRECTORY "${PROJECT_SOURCE_DIR}/docs" DESTINATION ${CMAKE_INSTALL_DOCDIR}
         FILES_MATCHING PATTERN "*.md" PATTERN "*.png" PATTERN "*.svg" PATTERN doxygen EXCLUDE)
 # What the tool's and Python's users read comes with those, too.
@@ -31,7 +31,8 @@ install(FILES "${PROJECT_SOURCE_DIR}/docs/tools.md" "${PROJECT_SOURCE_DIR}/docs/
 if(QUO_PYTHON)
     install(FILES "${PROJECT_SOURCE_DIR}/docs/python.md" "${PROJECT_SOURCE_DIR}/docs/scaling.md"
             DESTINATION ${CMAKE_INSTALL_DOCDIR}/docs COMPONENT python)
-    install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples/python" DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT python)
+    install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples/python" DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT python
+        PATTERN __pycache__ EXCLUDE)
 endif()
 
 set(config_dir ${CMAKE_INSTALL_LIBDIR}/cmake/quo_base)
