@@ -149,7 +149,9 @@ std::string names() {
         return std::filesystem::path{program}.parent_path().string();
     };
     return "PATH='" + folder_of(QUO_TOOL) + "':'" + folder_of(QUO_MAKE_HEADER) + "':'" +
-           folder_of(QUO_COMPLETE_PRODUCT) + R"(':"$PATH")" + "\nscenes='" QUO_TEST_DATA "/scenes' data='" +
+           folder_of(QUO_COMPLETE_PRODUCT) +
+           "':'" QUO_BUILD R"(/examples/chain':"$PATH")"
+           "\nscenes='" QUO_TEST_DATA "/scenes' data='" +
            QUO_TEST_DATA "/quo' docs='" QUO_DOCS "'\n" + R"(try() { quo "$@" || echo "[$?]"; })" + "\n";
 }
 
