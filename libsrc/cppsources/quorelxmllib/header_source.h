@@ -22,17 +22,13 @@ constexpr int kHeaderOptions = XML_PARSE_NOBLANKS | XML_PARSE_COMPACT | XML_PARS
 class XmlErrors {
 public:
     XmlErrors() noexcept {
-        handler_ = xmlStructuredError;
-        context_ = xmlStructuredErrorContext;
-        xmlSetStructuredErrorFunc(this, [](void* self, xmlError* error) {
-            auto& errors = *static_cast<XmlErrors*>(self);
-            if (error->code == XML_ERR_NO_MEMORY) errors.out_of_memory_ = true;
-            if (errors.line_ == 0) errors.note(*error);
-        });
-        static const bool ready = (xmlInitParser(), true);  // by one thread, before others parse
+        // By one thread, before others ask libxml2 for anything; what that prints where memory ends is caught,
+        // too.
+        static const bool ready = (take_over(), xmlInitParser(), give_back(), true);
         (void)ready;
+        take_over();
     }
-    ~XmlErrors() { xmlSetStructuredErrorFunc(context_, handler_); }
+    ~XmlErrors() { give_back(); }
     XmlErrors(const XmlErrors&) = delete;
     XmlErrors& operator=(const XmlErrors&) = delete;
 
@@ -43,14 +39,25 @@ public:
     }
 
 private:
+    void take_over() noexcept {
+        handler_ = xmlStructuredError;
+        context_ = xmlStructuredErrorContext;
+        xmlSetStructuredErrorFunc(this, [](void* self, xmlError* error) {
+            auto& errors = *static_cast<XmlErrors*>(self);
+            if (error->code == XML_ERR_NO_MEMORY) errors.out_of_memory_ = true;
+            if (errors.line_ == 0) errors.note(*error);
+        });
+    }
+    void give_back() noexcept { xmlSetStructuredErrorFunc(context_, handler_); }
+
     void note(const xmlError& error) noexcept {
         const std::string_view text = error.message ? error.message : "";
         copy_bounded(message_, text.substr(0, text.find('\n')));
         line_ = error.line;
     }
 
-    xmlStructuredErrorFunc handler_;
-    void* context_;
+    xmlStructuredErrorFunc handler_ = nullptr;
+    void* context_ = nullptr;
     bool out_of_memory_ = false;
     int line_ = 0;
     char message_[256] = "";
