@@ -267,7 +267,9 @@ int check(const ConfigOptions& options) {
     std::string text;
     for (const auto& [section, name, reason] : review.findings) {
         list.push_back({{"section", section}, {"name", name}, {"reason", reason}});
-        text += shown(section + (name.empty() ? "" : "/") + name + "  " + reason) + "\n";
+        std::string place = section;
+        if (!name.empty()) place.append("/").append(name);
+        text.append(shown(place.append("  ").append(reason))).append("\n");
     }
     text += std::to_string(review.findings.size()) + (review.findings.size() == 1 ? " error in " : " errors in ") +
             std::to_string(review.records.size()) + (review.records.size() == 1 ? " record\n" : " records\n");

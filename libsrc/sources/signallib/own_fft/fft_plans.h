@@ -19,7 +19,7 @@ struct FftKind {
     bool forward = true;
     int lanes = 4;
 
-    auto operator<=>(const FftKind&) const = default;
+    auto operator<=>(const FftKind&) const = default;  // NOLINT(modernize-use-nullptr): of the compiler's own 0
 };
 
 /** Whether a length has no prime factor above 7. */
