@@ -251,8 +251,8 @@ struct LaneFfts {
                 if constexpr (T == kLanes) {
                     x[k] = turn(x[k], held(load<false>(turns)));
                     turns = behind(turns, lanes_hop);
-                    if (next) ask<2>(ahead, kSlot);
-                    ahead = behind(ahead, lanes_hop);
+                    if (next) ask<2>(ahead, W);
+                    ahead = behind(ahead, lanes_hop / 2);
                 }
                 save<OutInterleaved>(x[k], T != kInner && k == 0 ? zero : out);
                 out = behind(out, out_hop);
@@ -263,7 +263,7 @@ struct LaneFfts {
             if (T == kOuter) ++roots;
             if (T == kLanes) {
                 lanes += kSlot;
-                if (next) next += kSlot;
+                if (next) next += W;
             }
             if (T == kInner && ++q == pass.stride) {
                 q = 0;
@@ -273,25 +273,18 @@ struct LaneFfts {
         }
     }
 
-    using PassKernel = void (*)(const FftPass&, const Route&);
-    using Radices = std::integer_sequence<int, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 12, 14, 15, 16, 20>;
-    static constexpr int kRadices = 21;
-    template <bool InInterleaved, bool OutInterleaved, Turns T, int... R>
-    static constexpr std::array<PassKernel, kRadices> passes_of(std::integer_sequence<int, R...> /*radices*/) {
-        std::array<PassKernel, kRadices> table{};
-        ((table[R] = pass<R, InInterleaved, OutInterleaved, T>), ...);
-        return table;
+    /** `body` with the radix as a constant. */
+    template <class Body, int... R>
+    QUO_FFT_INLINE void of_radix(int radix, std::integer_sequence<int, R...> /*radices*/, const Body& body) {
+        (void)((radix == R && (body(std::integral_constant<int, R>{}), true)) || ...);
     }
+    using Radices = std::integer_sequence<int, 16, 8, 4, 2, 20, 15, 14, 12, 10, 9, 7, 6, 5, 3, 1>;
     template <bool OutInterleaved, Turns T>
-    static PassKernel find(int radix, bool in_interleaved) {
-        static constexpr std::array<PassKernel, kRadices> kTables[] = {
-            passes_of<false, OutInterleaved, T>(Radices{}), passes_of<true, OutInterleaved, T>(Radices{})};
-        return kTables[in_interleaved ? 1 : 0][static_cast<std::size_t>(radix)];
-    }
-    static PassKernel last_pass(int radix, bool in_interleaved, bool out_interleaved, const Outer& outer) {
-        if (outer.lanes) return find<false, kLanes>(radix, in_interleaved);
-        if (outer.roots) return find<false, kOuter>(radix, in_interleaved);
-        return out_interleaved ? find<true, kNone>(radix, in_interleaved) : find<false, kNone>(radix, false);
+    static void any_pass(const FftPass& own, const Route& route, bool in_interleaved) {
+        of_radix(own.radix, Radices{}, [&](auto radix) {
+            if (in_interleaved) return pass<radix, true, OutInterleaved, T>(own, route);
+            pass<radix, false, OutInterleaved, T>(own, route);
+        });
     }
     /** So many packs, of which more than one are a single pass; `work` holds the transform twice. Backward
      * transforms are forward ones whose results stand in the opposite order. */
@@ -301,7 +294,7 @@ struct LaneFfts {
         for (int k = 0; k < last; ++k) {
             float* const next = route.out == work ? work + fft.length * kSlot : work;
             route.count = fft.length / fft.pass[k].radix;
-            find<false, kInner>(fft.pass[k].radix, k == 0 && in.interleaved)(fft.pass[k], route);
+            any_pass<false, kInner>(fft.pass[k], route, k == 0 && in.interleaved);
             route.in = route.out;
             route.in_step = route.in_next = kSlot;
             route.out = next;
@@ -318,34 +311,34 @@ struct LaneFfts {
             route.count = fft.pass[last].stride;
             route.out_next = route.out_step;
         }
-        last_pass(fft.pass[last].radix, last == 0 && in.interleaved, out.interleaved, outer)(fft.pass[last],
-                                                                                             route);
+        const bool interleaved = last == 0 && in.interleaved;
+        if (outer.lanes) return any_pass<false, kLanes>(fft.pass[last], route, interleaved);
+        if (outer.roots) return any_pass<false, kOuter>(fft.pass[last], route, interleaved);
+        if (out.interleaved) return any_pass<true, kNone>(fft.pass[last], route, interleaved);
+        any_pass<false, kNone>(fft.pass[last], route, interleaved);
     }
 
     // --- Transforms down the lanes
     // -------------------------------------------------------------------------------
 
-    /** Rows of an image: too far apart for the processor to see them coming, so that they are asked for early.
-     * More of them, a power of two apart, would push each other out of the first caches. */
-    static constexpr int kAhead = 6;
     static constexpr std::ptrdiff_t kLine = 16;
     template <int Nearness = 3>
     QUO_FFT_INLINE void ask(const float* row, std::ptrdiff_t floats) {
         for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(row + k, 0, Nearness);
     }
-    /** The first ones, while there is other work. */
-    static void ask_first(const float* row, std::ptrdiff_t step, int rows, std::ptrdiff_t floats) {
-        for (int k = 0; k < rows && k < kAhead; ++k, row += step) ask(row, floats);
-    }
-    /** Copies rows from an image to a stage or back; the stage's are closer together. */
+    /** Copies rows from an image to a stage or back; the stage's are closer together. The image's are too far
+     * apart for the processor to see them coming: a few are asked for early, and in the end the first of those
+     * that come `next`. More of them, a power of two apart, would push each other out of the first caches. */
     static void move(const float* from, std::ptrdiff_t from_step, float* to, std::ptrdiff_t to_step, int rows,
-                     std::ptrdiff_t floats) {
+                     std::ptrdiff_t floats, std::ptrdiff_t next = 0) {
+        constexpr int kAhead = 6;
         constexpr std::ptrdiff_t kWhole = kStripPacks * kSlot;
         const bool reads = from_step > to_step;
         const float* image = reads ? from : to;
         const std::ptrdiff_t step = reads ? from_step : to_step;
         for (int row = 0; row < rows; ++row, from += from_step, to += to_step, image += step) {
-            if (row + kAhead < rows) ask(image + kAhead * step, floats);
+            const bool here = row + kAhead < rows;
+            ask(here ? image + kAhead * step : image + (kAhead - rows) * step + next, floats);
             if (floats == kWhole)
                 std::memcpy(to, from, sizeof(float) * kWhole);
             else
@@ -362,8 +355,7 @@ struct LaneFfts {
         float *const work = room, *const stage = work + fft.work, *const tile = stage + fft.stage;
         for (int i = 0; i < n1; ++i) {
             const float* const in = columns.in + i * step;
-            move(in, n1 * step, stage, stage_step, n2, floats);
-            if (i + 1 < n1) ask_first(in + step, n1 * step, n2, floats);
+            move(in, n1 * step, stage, stage_step, n2, floats, step);
             for (int b = 0; b < packs; ++b)
                 run(fft.first, {stage + b * kSlot, stage_step, true},
                     {tile + (b * fft.pitch + i) * kSlot, tile_row, false}, {fft.outer + std::ptrdiff_t{i} * n2},
@@ -371,11 +363,10 @@ struct LaneFfts {
         }
         for (int k = 0; k < n2; ++k) {
             float* const out = columns.out + k * step;
-            ask_first(out, n2 * step, n1, floats);
             for (int b = 0; b < packs; ++b)
                 run(fft.second, {tile + (k * packs + b) * fft.pitch * kSlot, kSlot, false},
                     {stage + b * kSlot, stage_step, true}, {}, work);
-            move(stage, stage_step, out, n2 * step, n1, floats);
+            move(stage, stage_step, out, n2 * step, n1, floats, step);
         }
     }
     /** Whole packs, of which more than one are a single pass; or no more columns than lanes. */
@@ -473,18 +464,21 @@ struct LaneFfts {
         for (int lane = 0, b = 0; b * W < n1; ++b, tile += share) {
             lane = lane_of(b, n1);
             run(fft.first, {in + 2 * lane, 2 * std::ptrdiff_t{n1}, true}, {tile, kSlot, false},
-                {nullptr, fft.turns + b * share, next ? next + b * share : nullptr}, work);
+                {nullptr, fft.turns + b * share, next ? next + b * share / 2 : nullptr}, work);
         }
     }
     /** Step 2: W results are the lanes. */
-    static void across_results(const FftSteps& fft, const float* tile, float* out, float* stage, float* work) {
+    static void across_results(const FftSteps& fft, const float* tile, float* out, const float* next, float* stage,
+                               float* work) {
         const int n1 = fft.second.length, n2 = fft.first.length;
         for (int c = 0; c * W < n2; ++c) {
             const int result = lane_of(c, n2);
-            for (int b = 0; b * W < n1; ++b)
+            for (int b = 0; b * W < n1; ++b) {
+                if (next) ask<2>(next + (std::ptrdiff_t{n1} * c + std::ptrdiff_t{b} * W) * W, W * W);
                 for (const int part : {0, W})
                     turn_rows(tile + (std::ptrdiff_t{b} * n2 + result) * kSlot + part, kSlot,
                               stage + lane_of(b, n1) * kSlot + part, kSlot);
+            }
             run(fft.second, {stage, kSlot, false}, {out + 2 * result, 2 * std::ptrdiff_t{n2}, true}, {}, work);
         }
     }
@@ -494,8 +488,10 @@ struct LaneFfts {
         for (std::ptrdiff_t row = 0; row < rows.count; ++row) {
             const float* const in = rows.in + row * rows.step;
             const bool asks = row + 1 < rows.count && fft.first.length * fft.second.length <= kMostAsked;
-            across_samples(fft, in, asks ? in + rows.step : nullptr, tile, work);
-            across_results(fft, tile, rows.out + row * rows.step, stage, work);
+            const float* const next = asks ? in + rows.step : nullptr;
+            across_samples(fft, in, next, tile, work);
+            across_results(fft, tile, rows.out + row * rows.step,
+                           asks ? next + fft.first.length * fft.second.length : nullptr, stage, work);
         }
     }
 
@@ -528,18 +524,12 @@ struct LaneFfts {
             });
         }
     }
-    using RowKernel = void (*)(const FftImage&, float sign);
-    template <int... R>
-    static constexpr std::array<RowKernel, kRadices> row_kernels(std::integer_sequence<int, R...> /*radices*/) {
-        std::array<RowKernel, kRadices> table{};
-        ((table[R] = whole_rows<std::max(R, W / 2)>), ...);
-        return table;
-    }
     static void row_packs(const ShortFft& fft, const FftImage& rows, float* stage, float* work) {
-        static constexpr auto kKernels = row_kernels(Radices{});
         const int floats = 2 * fft.length;
         if (W <= 8 && fft.passes == 1)
-            return kKernels[static_cast<std::size_t>(fft.length)](rows, fft.backward ? -1.0F : 1.0F);
+            return of_radix(fft.length, Radices{}, [&](auto length) {
+                whole_rows<std::max<int>(length, W / 2)>(rows, fft.backward ? -1.0F : 1.0F);
+            });
         for (std::ptrdiff_t row = 0; row < rows.count; row += W) {
             const float* const in = rows.in + row * rows.step;
             float* const out = rows.out + row * rows.step;
