@@ -2,7 +2,7 @@
 #include "signallib/own_fft/fft_plans.h"
 
 #include <algorithm>
-#include <cmath>
+#include <complex>
 #include <cstdint>
 #include <limits>
 #include <map>
@@ -111,24 +111,19 @@ class Roots {
 public:
     Roots(int n, bool forward) {
         const double step = (forward ? -2.0 : 2.0) * std::numbers::pi / n;
-        for (int k = 0; k <= kMask; ++k) fine_.push_back({std::cos(step * k), std::sin(step * k)});
-        for (std::int64_t k = 0; k < n; k += kMask + 1) {
-            const double angle = step * static_cast<double>(k);
-            coarse_.push_back({std::cos(angle), std::sin(angle)});
-        }
+        for (int k = 0; k <= kMask; ++k) fine_.push_back(std::polar(1.0, step * k));
+        for (std::int64_t k = 0; k < n; k += kMask + 1)
+            coarse_.push_back(std::polar(1.0, step * static_cast<double>(k)));
     }
     FftRoot operator()(std::int64_t e) const {
-        const Exact &a = fine_[static_cast<std::size_t>(e & kMask)],
-                    &b = coarse_[static_cast<std::size_t>(e >> kShift)];
-        return {static_cast<float>(a.re * b.re - a.im * b.im), static_cast<float>(a.re * b.im + a.im * b.re)};
+        const std::complex<double> root =
+            fine_[static_cast<std::size_t>(e & kMask)] * coarse_[static_cast<std::size_t>(e >> kShift)];
+        return {static_cast<float>(root.real()), static_cast<float>(root.imag())};
     }
 
 private:
     static constexpr int kShift = 8, kMask = (1 << kShift) - 1;
-    struct Exact {
-        double re, im;
-    };
-    std::vector<Exact> fine_, coarse_;
+    std::vector<std::complex<double>> fine_, coarse_;
 };
 
 /** The result that the k-th slot of `count` leaves a transform as: backward ones leave in the opposite order. */
