@@ -10,6 +10,7 @@
 
 #include <algorithm>
 #include <chrono>
+#include <cstdint>
 #include <cstdlib>
 #include <memory>
 #include <string>
@@ -35,7 +36,8 @@ Image make_image(int n, int m) {
     return image;
 }
 
-/** Transforms along the rows, down the columns; how many times FFTW's speed is wanted, and by which engine. */
+/** Transforms along the rows, down the columns; how many times FFTW's speed is wanted, and by which engine. FFTW
+ * itself, whose plans are chosen without measuring, is not as fast as measured. */
 struct Job {
     const char* name;
     int n, m;
@@ -59,8 +61,8 @@ constexpr Job kJobs[] = {{"rows_1024", 1024, 1024, true, false, 1.4},
                          {"rows_64", 64, 1024, true, false},
                          {"rows_320", 320, 256, true, false},
                          {"rows_400", 400, 256, true, false},
-                         {"rows_4099", 4099, 256, true, false, 0.95, "fftw"},
-                         {"columns_4099", 256, 4099, false, true, 0.95, "fftw"}};
+                         {"rows_4099", 4099, 256, true, false, 0.7, "fftw"},
+                         {"columns_4099", 256, 4099, false, true, 0.7, "fftw"}};
 
 // A transform of a transform of a transform would overflow, so each starts from a fresh image.
 void tame(fcomplex* image, int n, int m) {
@@ -167,17 +169,20 @@ void bare_mkl(benchmark::State& state, const Job& job) {
     for (void* batch : batches) dfti().release(batch);
 }
 
-/** Columns of 4096 samples, 32 at a time, into a tile and out of it. */
+/** Columns of 4096 samples, 32 at a time, into a tile and out of it: each run a line of the cache or several. */
 void move_columns(benchmark::State& state) {
-    constexpr std::ptrdiff_t kSide = 4096, kWidth = 32;
-    const Image image = make_image(kSide, kSide), tile = make_image(kWidth + 8, kSide);
+    constexpr std::ptrdiff_t kSide = 4096, kWidth = 32, kLine = 8;
+    const Image image = make_image(kSide, kSide), tile = make_image(kWidth + kLine, kSide);
+    const auto skew =
+        static_cast<std::ptrdiff_t>(reinterpret_cast<std::uintptr_t>(image.get()) / sizeof(fcomplex));
     for (auto _ : state)
-        for (std::ptrdiff_t first = 0; first < kSide; first += kWidth)
+        for (std::ptrdiff_t first = 0, width = kWidth - skew % kLine; first < kSide;
+             first += width, width = kWidth)
             for (const bool in : {true, false})
                 for (std::ptrdiff_t row = 0; row < kSide; ++row) {
                     fcomplex* const there = image.get() + row * kSide + first;
-                    fcomplex* const here = tile.get() + row * (kWidth + 8);
-                    std::copy_n(in ? there : here, kWidth, in ? here : there);
+                    fcomplex* const here = tile.get() + row * (kWidth + kLine);
+                    std::copy_n(in ? there : here, std::min(width, kSide - first), in ? here : there);
                     benchmark::ClobberMemory();
                 }
 }

@@ -25,7 +25,7 @@ typedef struct quo_import_request {
     void* context; /**< handed to progress */
 } quo_import_request;
 
-/** How far image grid and orbit are off the tie points that the producer states, pixels: of the place that a tie
+/** How far pixel grid and orbit are off the tie points that the producer states, pixels: of the place that a tie
  * point has, and metres on the ground: of the pixel that it has. */
 typedef struct quo_tie_points {
     int32_t count;   /**< tie points that were compared: of those that the annotation has, but for the ones that no

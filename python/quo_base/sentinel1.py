@@ -16,7 +16,7 @@ Path = Union[str, os.PathLike]
 
 
 class TiePoints(NamedTuple):
-    """How far image grid and orbit are off the producer's tie points; 0 where the annotation has none."""
+    """How far pixel grid and orbit are off the producer's tie points; 0 where the annotation has none."""
 
     points: int
     """Number of tie points."""

@@ -131,7 +131,7 @@ TEST(OwnFft, EveryWidthOfVectorMeetsTheTruth) {
                 for (const bool forward : {true, false}) {
                     const quo::FftKernels* const kernels = quo::fft_kernels(lanes);
                     if (!kernels || (length > 30000 && count > 1)) continue;
-                    if (way == FftWay::ShortRows && !kernels->of(way)) continue;
+                    if (way == FftWay::ShortRows && lanes > 2 * length) continue;  // a row fills no vector
                     SCOPED_TRACE(testing::Message() << lanes << " lanes, " << count << " of " << length);
                     const bool rows = way != FftWay::Columns;
                     const auto pitch = (rows ? length : count) + kSpare;

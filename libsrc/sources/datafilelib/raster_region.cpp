@@ -17,8 +17,6 @@ namespace {
 
 // Large enough to make system calls rare, small enough to stay in the second-level cache while it is converted.
 constexpr std::int64_t kChunk = std::int64_t{1} << 19;
-// More for writing, where each call costs a journal's entry beside the copying.
-constexpr std::int64_t kWriteChunk = 2 * kChunk;
 // An output as large as this may still stand in a cache when it is looked at.
 constexpr std::int64_t kMostCached = std::int64_t{16} << 20;
 // Pieces nearer to each other than this are read in one transfer with what lies between.
@@ -136,6 +134,18 @@ private:
     char* to_;
 };
 
+// A line of samples that no cache holds any more: each piece asks for what lies a few pieces on, which the
+// processor by itself would see too late beside so many stores.
+void convert_from_memory(const RegionLayout& layout, std::int64_t piece, const char* from, char* to) {
+    constexpr std::int64_t kSmall = 1024, kAhead = 8 * kSmall, kLine = 64;
+    const std::int64_t in = layout.memory_piece / layout.samples, out = piece / layout.samples, few = kSmall / in;
+    for (std::int64_t i = 0; i < layout.samples; i += few) {
+        for (std::int64_t k = 0; k < kSmall; k += kLine) __builtin_prefetch(from + i * in + kAhead + k);
+        layout.kernel(from + i * in, to + i * out, static_cast<std::size_t>(std::min(few, layout.samples - i)),
+                      layout.swap);
+    }
+}
+
 // By way of memory, as far as the system does not copy by itself.
 int copy_through_memory(const RasterStream& from, std::int64_t place, const RasterStream& to,
                         std::int64_t to_place, std::int64_t bytes) {
@@ -234,7 +244,7 @@ int write_region(const RasterStream& stream, const RasterRegion& region, const R
                  const char* from) {
     if (region.count == 0 || region.piece == 0) return QUO_OK;
     const bool gapless = region.distance == region.piece;
-    const std::int64_t at_once = gapless ? std::max<std::int64_t>(1, kWriteChunk / region.piece) : 1;
+    const std::int64_t at_once = gapless ? std::max<std::int64_t>(1, kChunk / region.piece) : 1;
     TrackedBuffer<char> scratch{static_cast<std::size_t>(std::min(at_once, region.count) * region.piece)};
     if (!scratch) return QUO_NO_MEMORY;
     for (std::int64_t done = 0; done < region.count; done += at_once) {
@@ -243,7 +253,7 @@ int write_region(const RasterStream& stream, const RasterRegion& region, const R
             const char* row = from + (done + i) * layout.memory_row;
             char* room = scratch.data() + i * region.piece;
             if (layout.kernel) {
-                layout.kernel(row, room, static_cast<std::size_t>(layout.samples), layout.swap);
+                convert_from_memory(layout, region.piece, row, room);
             } else {
                 std::memcpy(room, row, static_cast<std::size_t>(region.piece));
             }

@@ -37,10 +37,10 @@ struct ShortFft {
  * `second.length` apart, whose results are turned, step 2 over neighbours. Along a row the lanes are neighbours in
  * step 1, results that are neighbours in step 2. */
 struct FftSteps {
-    ShortFft first, second;          ///< the second has no passes where one step is enough
-    const FftRoot* outer = nullptr;  ///< of columns: first.length for each sample of `second`
-    const float* turns = nullptr;    ///< of rows: a slot for each result of each pack of lanes
-    std::ptrdiff_t pitch = 0;        ///< slots from one transform of step 2 to the next; floats of a row
+    ShortFft first, second;                        ///< the second has no passes where one step is enough
+    const FftRoot* outer = nullptr;                ///< of columns: first.length for each sample of `second`
+    const float* turns = nullptr;                  ///< of rows: a slot for each result of each pack of lanes
+    std::ptrdiff_t pitch = 0;                      ///< of columns: slots from one transform of step 2 to the next
     std::ptrdiff_t tile = 0, stage = 0, work = 0;  ///< floats of room
 
     [[nodiscard]] bool two() const { return second.passes > 0; }

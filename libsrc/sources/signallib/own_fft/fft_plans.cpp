@@ -2,7 +2,7 @@
 #include "signallib/own_fft/fft_plans.h"
 
 #include <algorithm>
-#include <cmath>
+#include <complex>
 #include <cstdint>
 #include <limits>
 #include <map>
@@ -22,19 +22,19 @@ struct RadixCost {
     int radix;
     double cost;
 };
-constexpr RadixCost kRadixCosts[] = {{16, 30.0}, {15, 38.0}, {14, 42.0}, {12, 28.0}, {10, 26.0},
-                                     {9, 27.0},  {8, 21.0},  {7, 27.0},  {6, 21.0},  {5, 21.0},
-                                     {4, 17.0},  {3, 18.0},  {2, 15.0}};
-/** Through a buffer of its own. */
-constexpr double kMoved = 20.0;
+constexpr RadixCost kRadixCosts[] = {{20, 37.0}, {16, 30.0}, {15, 38.0}, {14, 42.0}, {12, 28.0},
+                                     {10, 26.0}, {9, 27.0},  {8, 21.0},  {7, 27.0},  {6, 21.0},
+                                     {5, 21.0},  {4, 17.0},  {3, 18.0},  {2, 15.0}};
+/** A slot whose lanes and results are exchanged, between the two steps of a row. */
+constexpr double kTurned = 8.0;
 /** Slots that begin within a line of the cache. */
-constexpr double kUnaligned = 4.0;
+constexpr double kUnaligned = 2.6;
 /** For each sample of a step, whose buffers may lie beyond the first cache. */
-constexpr double kPerSample = 0.1;
+constexpr double kPerSample = 0.19;
 /** Lengths up to this one are transformed in one step, whose buffers the first cache holds. */
 constexpr int kOneStep = 128;
-/** Short rows up to this length, eight at a time, leave room in the first cache. */
-constexpr int kCachedShortRow = 320;
+/** So many samples of short rows, and the buffers that they pass through, fit the first cache. */
+constexpr int kCachedShortRows = 2000;
 
 struct Passes {
     double cost = 0.0;
@@ -77,10 +77,8 @@ Split split(PassChoice& passes, int length, int lanes) {
     const auto first_cost = [&](int first, int second) {
         return passes.of(first).cost + kPerSample * first + (rows && second % 8 != 0 ? kUnaligned : 0.0);
     };
-    // Lanes and slots are exchanged on the way into a single pass, otherwise through the buffer before the next.
     const auto second_cost = [&](int second) {
-        const Passes& own = passes.of(second);
-        return own.cost + kPerSample * second + (rows && own.radices.size() > 1 ? kMoved : 0.0);
+        return passes.of(second).cost + kPerSample * second + (rows ? kTurned : 0.0);
     };
     const auto filled = [&](int count) { return static_cast<double>(packs_of(count, lanes)) * lanes / count; };
     for (int second = lanes; second <= length / lanes && second / 64 <= length / second; ++second) {
@@ -92,13 +90,19 @@ Split split(PassChoice& passes, int length, int lanes) {
     return best;
 }
 
-/** The same of rows that stand in one lane each: they take no turns. */
-double short_rows_cost(PassChoice& passes, int length) {
-    return passes.of(length).cost + 0.05 * std::max(length - kCachedShortRow, 0);
+/** The same of rows that stand in one lane each: they take no turns, but squares of them become slots and slots
+ * rows. Registers that hold a whole transform are best eight lanes wide. */
+double short_rows_cost(PassChoice& passes, int length, int lanes) {
+    const bool wide = lanes == 16;
+    if (lanes > 2 * length || (wide && passes.of(length).radices.size() < 2))
+        return length == 1 ? 0.0 : std::numeric_limits<double>::infinity();
+    const double squares = static_cast<double>(packs_of(2 * length, lanes)) * lanes / (2.0 * length);
+    const int beyond = std::max(length - kCachedShortRows / lanes, 0);
+    return passes.of(length).cost + (wide ? 13.0 : 10.0) * squares + (wide ? 0.5 : 0.18) * beyond;
 }
 
 /** What an operation takes on a vector of so many lanes. */
-double lane_weight(int lanes) { return lanes == 16 ? 1.0 : lanes == 8 ? 0.53 : 0.5; }
+double lane_weight(int lanes) { return lanes == 16 ? 1.0 : lanes == 8 ? 0.58 : 0.5; }
 
 // ---- Roots ----
 
@@ -107,24 +111,19 @@ class Roots {
 public:
     Roots(int n, bool forward) {
         const double step = (forward ? -2.0 : 2.0) * std::numbers::pi / n;
-        for (int k = 0; k <= kMask; ++k) fine_.push_back({std::cos(step * k), std::sin(step * k)});
-        for (std::int64_t k = 0; k < n; k += kMask + 1) {
-            const double angle = step * static_cast<double>(k);
-            coarse_.push_back({std::cos(angle), std::sin(angle)});
-        }
+        for (int k = 0; k <= kMask; ++k) fine_.push_back(std::polar(1.0, step * k));
+        for (std::int64_t k = 0; k < n; k += kMask + 1)
+            coarse_.push_back(std::polar(1.0, step * static_cast<double>(k)));
     }
     FftRoot operator()(std::int64_t e) const {
-        const Exact &a = fine_[static_cast<std::size_t>(e & kMask)],
-                    &b = coarse_[static_cast<std::size_t>(e >> kShift)];
-        return {static_cast<float>(a.re * b.re - a.im * b.im), static_cast<float>(a.re * b.im + a.im * b.re)};
+        const std::complex<double> root =
+            fine_[static_cast<std::size_t>(e & kMask)] * coarse_[static_cast<std::size_t>(e >> kShift)];
+        return {static_cast<float>(root.real()), static_cast<float>(root.imag())};
     }
 
 private:
     static constexpr int kShift = 8, kMask = (1 << kShift) - 1;
-    struct Exact {
-        double re, im;
-    };
-    std::vector<Exact> fine_, coarse_;
+    std::vector<std::complex<double>> fine_, coarse_;
 };
 
 /** The result that the k-th slot of `count` leaves a transform as: backward ones leave in the opposite order. */
@@ -175,8 +174,7 @@ FftKind choose_fft(const FftGeometry& geometry, int widest) {
         }
         // The number of rows must not matter: a row has the same bits among others as alone.
         offer(FftWay::Rows, lanes, split(passes, geometry.length, lanes).cost);
-        if (fft_kernels(lanes)->of(FftWay::ShortRows))
-            offer(FftWay::ShortRows, lanes, short_rows_cost(passes, geometry.length));
+        offer(FftWay::ShortRows, lanes, short_rows_cost(passes, geometry.length, lanes));
     }
     return best;
 }
@@ -200,7 +198,8 @@ FftTables::FftTables(const FftKind& kind) : kind_{kind}, kernels_{fft_kernels(ki
     if (second > 1) fft_.second = take_apart(second);
     const std::ptrdiff_t longest = std::max(fft_.first.length, second), slot = 2 * std::ptrdiff_t{kind.lanes};
     fft_.work = 2 * longest * slot;
-    fft_.stage = rows ? 0 : longest * slot * (second > 1 ? kStripPacks : 1);
+    fft_.stage = longest * slot * (second > 1 && !rows ? kStripPacks : 1);
+    if (kind.way == FftWay::ShortRows) fft_.tile = longest * slot;
     if (rows)
         lay_out_rows();
     else if (second > 1)
@@ -247,12 +246,10 @@ void FftTables::lay_out_columns() {
 
 void FftTables::lay_out_rows() {
     const int first = fft_.first.length, second = fft_.second.length, lanes = kind_.lanes;
-    fft_.pitch = 16 * (second / 8 | 1) + (second % 8 != 0 ? 32 : 0);  // whole lines of the cache, an odd number
-    fft_.tile = first * fft_.pitch;
     const Roots root{kind_.length, kind_.forward};
     const int packs = packs_of(second, lanes);
-    turned_ =
-        static_cast<std::size_t>(packs) * static_cast<std::size_t>(first) * static_cast<std::size_t>(lanes) * 2;
+    fft_.tile = std::ptrdiff_t{packs} * first * lanes * 2;
+    turned_ = static_cast<std::size_t>(fft_.tile);
     turns_ = allocate_floats(turned_);
     if (!turns_) throw std::bad_alloc{};
     fft_.turns = turns_.get();

@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <array>
 #include <cstddef>
+#include <cstdint>
 #include <cstring>
 #include <utility>
 #if defined(__FMA__)
@@ -35,8 +36,6 @@ struct LaneFfts {
     typedef float V __attribute__((vector_size(4 * W)));
     typedef float Loose __attribute__((vector_size(4 * W), aligned(4), may_alias));
     static constexpr std::ptrdiff_t kSlot = 2 * W;
-    /** Wider vectors would not make them faster: loads and stores of their samples take most of the time. */
-    static constexpr bool kShortRows = W <= 8;
 
 #define QUO_FFT_HERE __attribute__((always_inline))
 #define QUO_FFT_INLINE QUO_FFT_HERE static inline
@@ -191,151 +190,155 @@ struct LaneFfts {
     // --- Passes
     // --------------------------------------------------------------------------------------------------
 
-    /** What results are turned by, if anything: all lanes by one root, or each by its own, in slots. */
+    /** What results are turned by, if anything: all lanes by one root, or each by its own, in slots. With these,
+     * as much of what comes `next` is asked for, into the second cache. */
     struct Outer {
         const FftRoot* roots = nullptr;
         const float* lanes = nullptr;
+        const float* next = nullptr;
     };
-    /** A pass from slots `in_step` apart to slots `out_step` apart. `zero` takes result 0. */
+    /** Slots `step` apart; where one pass is all of several packs, these lie side by side. */
+    template <class Float>
+    struct Slots {
+        Float* at;
+        std::ptrdiff_t step;
+        bool interleaved;
+    };
+    using From = Slots<const float>;
+    using To = Slots<float>;
+
+    /** A pass over `count` butterflies, whose first values lie `next` apart. `zero` takes result 0. */
     struct Route {
         const float* in;
         float *out, *zero;
-        std::ptrdiff_t in_step, out_step = kSlot;
-        Outer outer{};
-        float sign = 1.0F;  ///< of imaginary parts that become lanes or come from them
-        int many = W;       ///< rows or columns that one pass is all of
+        std::ptrdiff_t in_step, out_step, in_next, out_next;
+        int count;
+        Outer outer;
     };
     enum Turns { kNone, kInner, kOuter, kLanes };
 
-    template <bool Interleaved, int R>
-    QUO_FFT_INLINE void save_all(const C (&x)[R], float* to, float* zero, std::ptrdiff_t hop) {
-        save<Interleaved>(x[0], zero);
-        each<R - 1>([&](auto k) QUO_FFT_HERE { save<Interleaved>(x[k + 1], to + (k + 1) * hop); });
+    /** One address that moves on: the compiler would keep more of them than there are registers. */
+    template <class Float>
+    QUO_FFT_INLINE Float* behind(Float* at, std::ptrdiff_t hop) {
+        at += hop;
+        asm("" : "+r"(at));
+        return at;
     }
 
     template <int R, bool InInterleaved, bool OutInterleaved, Turns T>
     static void pass(const FftPass& pass, const Route& route) {
         const std::ptrdiff_t in_hop = pass.count * pass.stride * route.in_step;
-        const std::ptrdiff_t out_hop = pass.stride * route.out_step;
+        const std::ptrdiff_t out_hop = pass.stride * route.out_step, lanes_hop = pass.stride * kSlot;
         const FftRoot* roots = T == kOuter ? route.outer.roots : pass.roots;
-        // Columns that one pass is all of: their packs lie side by side.
-        constexpr bool kPacks = InInterleaved && T == kNone;
-        const int some = kPacks ? route.many / W : pass.stride;
-        const std::ptrdiff_t in_next = kPacks ? kSlot : route.in_step, out_next = kPacks ? kSlot : route.out_step;
-        for (int p = 0; p < pass.count; ++p) {
-            const float* from = route.in + std::ptrdiff_t{p} * pass.stride * route.in_step;
-            float* to = route.out + std::ptrdiff_t{p} * R * out_hop;
-            for (int q = 0; q < some; ++q, from += in_next, to += out_next) {
-                C x[R];
-                each<R>([&](auto j) QUO_FFT_HERE {
-                    x[j] = load<InInterleaved>(from + j * in_hop);
-                    constexpr bool kFits = Level == ProcessorLevel::kAvx512 && R <= 8;
-                    if constexpr (kFits && !InInterleaved) x[j] = held(x[j]);
-                });
-                butterfly<R>(x);
-                if constexpr (T == kInner)
-                    each<R - 1>([&](auto k) QUO_FFT_HERE { x[k + 1] = turn(x[k + 1], held(spread(roots[k]))); });
-                if constexpr (T == kOuter)
-                    each<R>([&](auto k)
-                                QUO_FFT_HERE { x[k] = turn(x[k], held(spread(roots[q + k * pass.stride]))); });
-                if constexpr (T == kLanes)
-                    each<R>([&](auto k) QUO_FFT_HERE {
-                        x[k] = turn(x[k], held(load<false>(route.outer.lanes + (q + k * pass.stride) * kSlot)));
-                    });
-                float* const zero = kPacks ? route.zero + q * kSlot : T != kInner && q == 0 ? route.zero : to;
-                save_all<OutInterleaved>(x, to, zero, out_hop);
+        const float *lanes = route.outer.lanes, *next = route.outer.next;
+        const float* from = route.in;
+        float *to = route.out, *zero = route.zero;
+        for (int i = 0, q = 0; i < route.count; ++i) {
+            C x[R];
+            const float* in = from;
+            each<R>([&](auto j) QUO_FFT_HERE {
+                x[j] = load<InInterleaved>(in);
+                constexpr bool kFits = Level == ProcessorLevel::kAvx512 && R <= 8;
+                if constexpr (kFits && !InInterleaved) x[j] = held(x[j]);
+                in = behind(in, in_hop);
+            });
+            butterfly<R>(x);
+            float* out = to;
+            const float *turns = lanes, *ahead = next;
+            each<R>([&](auto k) QUO_FFT_HERE {
+                if constexpr (T == kInner && k > 0) x[k] = turn(x[k], held(spread(roots[k - 1])));
+                if constexpr (T == kOuter) x[k] = turn(x[k], held(spread(roots[k * pass.stride])));
+                if constexpr (T == kLanes) {
+                    x[k] = turn(x[k], held(load<false>(turns)));
+                    turns = behind(turns, lanes_hop);
+                    if (next) ask<2>(ahead, W);
+                    ahead = behind(ahead, lanes_hop / 2);
+                }
+                save<OutInterleaved>(x[k], T != kInner && k == 0 ? zero : out);
+                out = behind(out, out_hop);
+            });
+            from += route.in_next;
+            to += route.out_next;
+            zero = pass.stride == 1 ? zero + route.out_next : to;
+            if (T == kOuter) ++roots;
+            if (T == kLanes) {
+                lanes += kSlot;
+                if (next) next += W;
             }
-            if constexpr (T == kInner) roots += R - 1;
+            if (T == kInner && ++q == pass.stride) {
+                q = 0;
+                to += (R - 1) * out_hop;
+                roots += R - 1;
+            }
         }
     }
 
-    using PassKernel = void (*)(const FftPass&, const Route&);
-    using Radices = std::integer_sequence<int, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 12, 14, 15, 16>;
-    static constexpr int kRadices = 17;
-    template <bool InInterleaved, bool OutInterleaved, Turns T, int... R>
-    static constexpr std::array<PassKernel, kRadices> passes_of(std::integer_sequence<int, R...> /*radices*/) {
-        std::array<PassKernel, kRadices> table{};
-        ((table[R] = pass<R, InInterleaved, OutInterleaved, T>), ...);
-        return table;
+    /** `body` with the radix as a constant. */
+    template <class Body, int... R>
+    QUO_FFT_INLINE void of_radix(int radix, std::integer_sequence<int, R...> /*radices*/, const Body& body) {
+        (void)((radix == R && (body(std::integral_constant<int, R>{}), true)) || ...);
     }
-    template <bool InInterleaved, bool OutInterleaved, Turns T>
-    static PassKernel find(int radix) {
-        static constexpr auto kTable = passes_of<InInterleaved, OutInterleaved, T>(Radices{});
-        return kTable[static_cast<std::size_t>(radix)];
+    using Radices = std::integer_sequence<int, 16, 8, 4, 2, 20, 15, 14, 12, 10, 9, 7, 6, 5, 3, 1>;
+    template <bool OutInterleaved, Turns T>
+    static void any_pass(const FftPass& own, const Route& route, bool in_interleaved) {
+        of_radix(own.radix, Radices{}, [&](auto radix) {
+            if (in_interleaved) return pass<radix, true, OutInterleaved, T>(own, route);
+            pass<radix, false, OutInterleaved, T>(own, route);
+        });
     }
-
-    /** Where the slots of a transform stand: as they are, interleaved, or one lane a row of samples, each `step`
-     * after the last. */
-    enum Form { kSplit, kInterleaved, kAcross };
-    template <class Float>
-    struct Slots {
-        Float* at;
-        std::ptrdiff_t step;
-        Form form;
-    };
-    using From = Slots<const float>;
-    using To = Slots<float>;
-
-    static PassKernel first_pass(int radix, Form in) {
-        if (in == kAcross) return row_kernels(radix).in;
-        return in == kInterleaved ? find<true, false, kInner>(radix) : find<false, false, kInner>(radix);
-    }
-    static PassKernel last_pass(int radix, Form in, Form out, const Outer& outer) {
-        if (in == kAcross) return out == kAcross ? row_kernels(radix).whole : row_kernels(radix).across;
-        const bool apart = in == kSplit;
-        if (out == kAcross) return row_kernels(radix).out;
-        if (outer.lanes) return apart ? find<false, true, kLanes>(radix) : find<true, true, kLanes>(radix);
-        if (outer.roots) return apart ? find<false, false, kOuter>(radix) : find<true, false, kOuter>(radix);
-        return apart ? find<false, true, kNone>(radix) : find<true, true, kNone>(radix);
-    }
-    /** `many` of them, if one pass is all; `work` holds the transform twice. Backward transforms are forward ones
-     * whose results stand in the opposite order, or the conjugate ones of conjugate rows. */
-    static void run(const ShortFft& fft, From in, To out, Outer outer, float* work, int many = W) {
+    /** So many packs, of which more than one are a single pass; `work` holds the transform twice. Backward
+     * transforms are forward ones whose results stand in the opposite order. */
+    static void run(const ShortFft& fft, From in, To out, Outer outer, float* work, int packs = 1) {
         const int last = fft.passes - 1;
-        Route route{in.at, work, work, in.step, kSlot, outer};
-        const bool conjugate = fft.backward && out.form == kAcross;
-        if (conjugate) route.sign = -1.0F;
-        route.many = many;
+        Route route{in.at, work, work, in.step, kSlot, in.step, kSlot, packs, outer};
         for (int k = 0; k < last; ++k) {
             float* const next = route.out == work ? work + fft.length * kSlot : work;
-            first_pass(fft.pass[k].radix, k == 0 ? in.form : kSplit)(fft.pass[k], route);
+            route.count = fft.length / fft.pass[k].radix;
+            any_pass<false, kInner>(fft.pass[k], route, k == 0 && in.interleaved);
             route.in = route.out;
-            route.in_step = kSlot;
+            route.in_step = route.in_next = kSlot;
             route.out = next;
         }
         route.out = route.zero = out.at;
         route.out_step = out.step;
-        if (fft.backward && !conjugate) {
+        if (fft.backward) {
             route.out += fft.length * out.step;
             route.out_step = -out.step;
         }
-        last_pass(fft.pass[last].radix, last == 0 ? in.form : kSplit, out.form, outer)(fft.pass[last], route);
+        if (last == 0) {
+            route.in_next = route.out_next = kSlot;
+        } else {
+            route.count = fft.pass[last].stride;
+            route.out_next = route.out_step;
+        }
+        const bool interleaved = last == 0 && in.interleaved;
+        if (outer.lanes) return any_pass<false, kLanes>(fft.pass[last], route, interleaved);
+        if (outer.roots) return any_pass<false, kOuter>(fft.pass[last], route, interleaved);
+        if (out.interleaved) return any_pass<true, kNone>(fft.pass[last], route, interleaved);
+        any_pass<false, kNone>(fft.pass[last], route, interleaved);
     }
 
     // --- Transforms down the lanes
     // -------------------------------------------------------------------------------
 
-    /** Rows of an image: too far apart for the processor to see them coming, so that they are asked for early.
-     * More of them, a power of two apart, would push each other out of the first caches. */
-    static constexpr int kAhead = 6;
+    static constexpr std::ptrdiff_t kLine = 16;
     template <int Nearness = 3>
     QUO_FFT_INLINE void ask(const float* row, std::ptrdiff_t floats) {
-        constexpr std::ptrdiff_t kLine = 16;
         for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(row + k, 0, Nearness);
     }
-    /** The first ones, while there is other work. */
-    static void ask_first(const float* row, std::ptrdiff_t step, int rows, std::ptrdiff_t floats) {
-        for (int k = 0; k < rows && k < kAhead; ++k, row += step) ask(row, floats);
-    }
-    /** Copies rows from an image to a stage or back; the stage's are closer together. */
+    /** Copies rows from an image to a stage or back; the stage's are closer together. The image's are too far
+     * apart for the processor to see them coming: a few are asked for early, and in the end the first of those
+     * that come `next`. More of them, a power of two apart, would push each other out of the first caches. */
     static void move(const float* from, std::ptrdiff_t from_step, float* to, std::ptrdiff_t to_step, int rows,
-                     std::ptrdiff_t floats) {
+                     std::ptrdiff_t floats, std::ptrdiff_t next = 0) {
+        constexpr int kAhead = 6;
         constexpr std::ptrdiff_t kWhole = kStripPacks * kSlot;
         const bool reads = from_step > to_step;
         const float* image = reads ? from : to;
         const std::ptrdiff_t step = reads ? from_step : to_step;
         for (int row = 0; row < rows; ++row, from += from_step, to += to_step, image += step) {
-            if (row + kAhead < rows) ask(image + kAhead * step, floats);
+            const bool here = row + kAhead < rows;
+            ask(here ? image + kAhead * step : image + (kAhead - rows) * step + next, floats);
             if (floats == kWhole)
                 std::memcpy(to, from, sizeof(float) * kWhole);
             else
@@ -352,263 +355,215 @@ struct LaneFfts {
         float *const work = room, *const stage = work + fft.work, *const tile = stage + fft.stage;
         for (int i = 0; i < n1; ++i) {
             const float* const in = columns.in + i * step;
-            move(in, n1 * step, stage, stage_step, n2, floats);
-            if (i + 1 < n1) ask_first(in + step, n1 * step, n2, floats);
+            move(in, n1 * step, stage, stage_step, n2, floats, step);
             for (int b = 0; b < packs; ++b)
-                run(fft.first, {stage + b * kSlot, stage_step, kInterleaved},
-                    {tile + (b * fft.pitch + i) * kSlot, tile_row, kSplit}, {fft.outer + std::ptrdiff_t{i} * n2},
+                run(fft.first, {stage + b * kSlot, stage_step, true},
+                    {tile + (b * fft.pitch + i) * kSlot, tile_row, false}, {fft.outer + std::ptrdiff_t{i} * n2},
                     work);
         }
         for (int k = 0; k < n2; ++k) {
             float* const out = columns.out + k * step;
-            ask_first(out, n2 * step, n1, floats);
             for (int b = 0; b < packs; ++b)
-                run(fft.second, {tile + (k * packs + b) * fft.pitch * kSlot, kSlot, kSplit},
-                    {stage + b * kSlot, stage_step, kInterleaved}, {}, work);
-            move(stage, stage_step, out, n2 * step, n1, floats);
+                run(fft.second, {tile + (k * packs + b) * fft.pitch * kSlot, kSlot, false},
+                    {stage + b * kSlot, stage_step, true}, {}, work);
+            move(stage, stage_step, out, n2 * step, n1, floats, step);
         }
     }
     /** Whole packs, of which more than one are a single pass; or no more columns than lanes. */
     static void one_step(const FftSteps& fft, const FftImage& columns, float* room) {
         const std::ptrdiff_t step = columns.step, floats = 2 * std::ptrdiff_t{columns.count};
         if (columns.count % W == 0)
-            return run(fft.first, {columns.in, step, kInterleaved}, {columns.out, step, kInterleaved}, {}, room,
-                       columns.count);
+            return run(fft.first, {columns.in, step, true}, {columns.out, step, true}, {}, room,
+                       columns.count / W);
         float* const stage = room + fft.work;
         move(columns.in, step, stage, kSlot, fft.first.length, floats);
-        run(fft.first, {stage, kSlot, kInterleaved}, {stage, kSlot, kInterleaved}, {}, room);
+        run(fft.first, {stage, kSlot, true}, {stage, kSlot, true}, {}, room);
         move(stage, kSlot, columns.out, step, fft.first.length, floats);
     }
+    /** Columns between the beginning of a line of the cache, or of a pack, and the first; where rows differ, none
+     * is better than another. */
+    static int skew(const FftImage& columns) {
+        const auto first = reinterpret_cast<std::uintptr_t>(columns.in) / sizeof(FftRoot);
+        return columns.step % kLine == 0 ? static_cast<int>(first % std::min(W, 8)) : 0;
+    }
+    /** After the first ones, packs begin with a line of the cache. */
     static void columns(const FftSteps& fft, const FftImage& columns, float* room) noexcept {
-        const bool whole = !fft.two() && fft.first.passes == 1 && columns.count > W;
-        const int width = whole ? columns.count / W * W : fft.two() ? kStripPacks * W : W;
-        for (std::ptrdiff_t c = 0; c < columns.count; c += width) {
+        const bool two = fft.two();
+        const int strip = two ? kStripPacks * W : W;
+        int width = strip - skew(columns);
+        for (std::ptrdiff_t c = 0; c < columns.count; c += width, width = strip) {
             const int left = columns.count - static_cast<int>(c);
-            (fft.two() ? two_steps : one_step)(
-                fft, {columns.in + 2 * c, columns.out + 2 * c, columns.step, left < width ? left : width}, room);
+            if (!two && fft.first.passes == 1 && left > W && width == strip) width = left / W * W;
+            (two ? two_steps : one_step)(
+                fft, {columns.in + 2 * c, columns.out + 2 * c, columns.step, std::min(left, width)}, room);
         }
     }
 
     // --- Rows
     // ----------------------------------------------------------------------------------------------------
 
-    /** Within each quarter of four lanes: `Run` of the first vector and `Run` of the second by turns, from the
-     * lower halves or the upper ones. */
-    template <int Run, bool Upper, std::size_t... I>
-    QUO_FFT_INLINE V weave(V a, V b, std::index_sequence<I...> /*lanes*/) {
-        return __builtin_shufflevector(
-            a, b, (I / 4 * 4 + I % 4 / (2 * Run) + I % Run + (Upper ? 2 : 0) + I / Run % 2 * W)...);
+    /** Of two vectors: `Run` lanes are taken and as many left by turns, beginning with the first, or those left.
+     */
+    template <int Run, bool Left, std::size_t... I>
+    QUO_FFT_INLINE V pick(V a, V b, std::index_sequence<I...> /*lanes*/) {
+        return __builtin_shufflevector(a, b, (I / Run * 2 * Run + I % Run + (Left ? Run : 0))...);
     }
-    typedef float Four __attribute__((vector_size(16), aligned(4), may_alias));
-    template <class A, std::size_t... I>
-    QUO_FFT_INLINE auto concatenate(A a, A b, std::index_sequence<I...> /*lanes of both*/) {
-        return __builtin_shufflevector(a, b, I...);
+    /** Within each quarter of four lanes: two of the first vector and two of the second, `Step` apart. */
+    template <int First, int Step, std::size_t... I>
+    QUO_FFT_INLINE V twos(V a, V b, std::index_sequence<I...> /*lanes*/) {
+        return __builtin_shufflevector(a, b, (I / 4 * 4 + First + I % 2 * Step + I / 2 % 2 * W)...);
     }
-    /** Four floats each of N rows. */
-    template <int N>
-    QUO_FFT_INLINE auto fours(const float* from, std::ptrdiff_t step) {
-        if constexpr (N == 1)
-            return *reinterpret_cast<const Four*>(from);
-        else
-            return concatenate(fours<N / 2>(from, step), fours<N / 2>(from + N / 2 * step, step),
-                               std::make_index_sequence<4 * N>{});
-    }
-    template <int First, std::size_t... I>
-    QUO_FFT_INLINE void save_four(V v, float* to, std::index_sequence<I...> /*lanes*/) {
-        *reinterpret_cast<Four*>(to) = __builtin_shufflevector(v, v, (First + I)...);
-    }
-    /** Squares of four lanes of four vectors are turned: lane 4 c + i of vector j was lane 4 c + j of vector i. */
-    QUO_FFT_INLINE void turn_fours(V (&v)[4]) {
+    /** Lane i of vector k was lane k of vector i: squares of four lanes first, then these among each other. */
+    QUO_FFT_INLINE void turn_square(V (&v)[W]) {
         constexpr std::make_index_sequence<W> kLanes;
-        const V low = weave<1, false>(v[0], v[1], kLanes), high = weave<1, true>(v[0], v[1], kLanes);
-        const V next_low = weave<1, false>(v[2], v[3], kLanes), next_high = weave<1, true>(v[2], v[3], kLanes);
-        v[0] = weave<2, false>(low, next_low, kLanes);
-        v[1] = weave<2, true>(low, next_low, kLanes);
-        v[2] = weave<2, false>(high, next_high, kLanes);
-        v[3] = weave<2, true>(high, next_high, kLanes);
-    }
-    /** Four vectors, whose squares are turned, become four floats each of W rows. */
-    QUO_FFT_INLINE void save_fours(V (&v)[4], float* to, std::ptrdiff_t step) {
-        turn_fours(v);
-        each<W>([&](auto row) QUO_FFT_HERE {
-            save_four<row / 4 * 4>(v[row % 4], to + row * step, std::make_index_sequence<4>{});
+        each<W / 4>([&](auto g) QUO_FFT_HERE {
+            V* const f = v + 4 * g;
+            const V low = twos<0, 1>(f[0], f[1], kLanes), high = twos<2, 1>(f[0], f[1], kLanes);
+            const V low2 = twos<0, 1>(f[2], f[3], kLanes), high2 = twos<2, 1>(f[2], f[3], kLanes);
+            f[0] = twos<0, 2>(low, low2, kLanes);
+            f[1] = twos<1, 2>(low, low2, kLanes);
+            f[2] = twos<0, 2>(high, high2, kLanes);
+            f[3] = twos<1, 2>(high, high2, kLanes);
         });
+        for (int run = 4; run < W; run *= 2) {
+            V turned[W];
+            each<W / 2>([&](auto k) QUO_FFT_HERE {
+                constexpr int at = k / 4 * 8 + k % 4;
+                turned[k] = pick<4, false>(v[at], v[at + 4], kLanes);
+                turned[k + W / 2] = pick<4, true>(v[at], v[at + 4], kLanes);
+            });
+            each<W>([&](auto k) QUO_FFT_HERE { v[k] = turned[k]; });
+        }
+    }
+    /** W floats of each of W rows, lane by lane: reads them where they are rows and leaves them turned. */
+    QUO_FFT_INLINE void load_square(const float* from, std::ptrdiff_t step, V (&v)[W]) {
+        each<W>([&](auto k) QUO_FFT_HERE {
+            v[k] = *reinterpret_cast<const Loose*>(from);
+            from = behind(from, step);
+        });
+        turn_square(v);
+    }
+    QUO_FFT_INLINE void save_rows(const V (&v)[W], float* to, std::ptrdiff_t step) {
+        each<W>([&](auto k) QUO_FFT_HERE {
+            *reinterpret_cast<Loose*>(to) = v[k];
+            to = behind(to, step);
+        });
+    }
+    QUO_FFT_INLINE void turn_rows(const float* from, std::ptrdiff_t from_step, float* to, std::ptrdiff_t to_step) {
+        V v[W];
+        load_square(from, from_step, v);
+        save_rows(v, to, to_step);
     }
     /** First of a pack's lanes: the last pack overlaps the one before it. */
     QUO_FFT_INLINE int lane_of(int pack, int count) { return (pack + 1) * W <= count ? pack * W : count - W; }
 
-    /** Step 1: what it leaves is a row of the tile for each of its results. The `next` row is asked for on the
-     * way, into the second cache: all at once it would keep what this one needs waiting. */
-    static void across_samples(const FftSteps& fft, const float* in, const float* next, float* tile, float* room) {
-        constexpr std::ptrdiff_t kMostAsked = 1 << 15;
+    /** Step 1: what it leaves is the slots of its results, pack by pack. */
+    static void across_samples(const FftSteps& fft, const float* in, const float* next, float* tile, float* work) {
         const int n1 = fft.second.length;
         const std::ptrdiff_t share = fft.first.length * kSlot;
-        for (int b = 0; b * W < n1; ++b) {
-            const int lane = lane_of(b, n1);
-            if (b * share < kMostAsked) ask<2>(next + b * share, share);
-            run(fft.first, {in + 2 * lane, 2 * std::ptrdiff_t{n1}, kInterleaved},
-                {tile + 2 * lane, fft.pitch, kInterleaved}, {nullptr, fft.turns + b * share}, room);
+        for (int lane = 0, b = 0; b * W < n1; ++b, tile += share) {
+            lane = lane_of(b, n1);
+            run(fft.first, {in + 2 * lane, 2 * std::ptrdiff_t{n1}, true}, {tile, kSlot, false},
+                {nullptr, fft.turns + b * share, next ? next + b * share / 2 : nullptr}, work);
         }
     }
-    /** Step 2: W rows of the tile are the lanes. */
-    static void across_results(const FftSteps& fft, const float* tile, float* out, float* room) {
-        const int n2 = fft.first.length;
-        const std::ptrdiff_t step = 2 * std::ptrdiff_t{n2};
-        if (fft.second.passes == 1)
-            return run(fft.second, {tile, fft.pitch, kAcross}, {out, step, kInterleaved}, {}, room, n2);
+    /** Step 2: W results are the lanes. */
+    static void across_results(const FftSteps& fft, const float* tile, float* out, const float* next, float* stage,
+                               float* work) {
+        const int n1 = fft.second.length, n2 = fft.first.length;
         for (int c = 0; c * W < n2; ++c) {
             const int result = lane_of(c, n2);
-            run(fft.second, {tile + result * fft.pitch, fft.pitch, kAcross},
-                {out + 2 * result, step, kInterleaved}, {}, room);
+            for (int b = 0; b * W < n1; ++b) {
+                if (next) ask<2>(next + (std::ptrdiff_t{n1} * c + std::ptrdiff_t{b} * W) * W, W * W);
+                for (const int part : {0, W})
+                    turn_rows(tile + (std::ptrdiff_t{b} * n2 + result) * kSlot + part, kSlot,
+                              stage + lane_of(b, n1) * kSlot + part, kSlot);
+            }
+            run(fft.second, {stage, kSlot, false}, {out + 2 * result, 2 * std::ptrdiff_t{n2}, true}, {}, work);
         }
     }
     static void rows(const FftSteps& fft, const FftImage& rows, float* room) noexcept {
-        float* const rest = room + fft.tile;
+        constexpr int kMostAsked = 1 << 14;
+        float *const tile = room, *const stage = tile + fft.tile, *const work = stage + fft.stage;
         for (std::ptrdiff_t row = 0; row < rows.count; ++row) {
             const float* const in = rows.in + row * rows.step;
-            across_samples(fft, in, row + 1 < rows.count ? in + rows.step : in, room, rest);
-            across_results(fft, room, rows.out + row * rows.step, rest);
+            const bool asks = row + 1 < rows.count && fft.first.length * fft.second.length <= kMostAsked;
+            const float* const next = asks ? in + rows.step : nullptr;
+            across_samples(fft, in, next, tile, work);
+            across_results(fft, tile, rows.out + row * rows.step,
+                           asks ? next + fft.first.length * fft.second.length : nullptr, stage, work);
         }
     }
 
     // --- Short rows, one a lane
     // ----------------------------------------------------------------------------------
 
-    /** Floats from row to row, and 1, or -1 for the backward transform: the conjugate one of the conjugate row. */
-    struct Gap {
-        std::ptrdiff_t step;
-        float sign;
-    };
-    /** Two neighbouring samples of W rows, their imaginary parts times `sign`. */
-    QUO_FFT_INLINE void load_two(const float* from, const Gap& gap, C& first, C& second) {
-        V v[4];
-        each<4>([&](auto k) QUO_FFT_HERE { v[k] = fours<W / 4>(from + k * gap.step, 4 * gap.step); });
-        turn_fours(v);
-        first = {v[0], v[1] * gap.sign};
-        second = {v[2], v[3] * gap.sign};
-    }
-    QUO_FFT_INLINE void save_two(C first, C second, float* to, const Gap& gap) {
-        V v[4] = {first.re, first.im * gap.sign, second.re, second.im * gap.sign};
-        save_fours(v, to, gap.step);
-    }
-    /** First of two neighbours: at an odd end the last two overlap those before. */
-    static constexpr int pair_of(int i, int count) { return i + 2 > count ? count - 2 : i; }
-
-    /** W rows. */
+    /** Packs of rows that registers hold; the backward transform is the conjugate one of the conjugate row. */
     template <int N>
-    QUO_FFT_INLINE void load_rows(const float* from, const Gap& gap, C (&x)[N]) {
-        each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
-            constexpr int at = pair_of(2 * i, N);
-            load_two(from + 2 * at, gap, x[at], x[at + 1]);
-        });
-    }
-    /** Rows whose samples registers hold: they become rows again, or slots, so many that these lie side by side.
-     */
-    template <int N, bool RowsAgain>
-    static void whole_rows(const FftPass& /*pass*/, const Route& route) {
-        const Gap in{route.in_step, route.sign}, out{route.out_step, route.sign};
-        const std::ptrdiff_t out_row = RowsAgain ? out.step : 2;
-        const int rows = route.many;
-        const float* from = route.in;
-        float* to = route.out;
-        for (int row = 0, hop = 0; row < rows; row += hop, from += hop * in.step, to += hop * out_row) {
-            const int left = rows - row - W;
-            hop = left == 0 || left >= W ? W : left;  // the last pack overlaps the one before it
-            if constexpr (N == 1) {
-                each<W>([&](auto i)
-                            QUO_FFT_HERE { std::memcpy(to + i * out.step, from + i * in.step, sizeof(FftRoot)); });
-            } else {
-                C x[N];
-                load_rows(from, in, x);
-                butterfly<N>(x);
-                if constexpr (RowsAgain)
-                    each<(N + 1) / 2>([&](auto i) QUO_FFT_HERE {
-                        constexpr int at = pair_of(2 * i, N);
-                        save_two(x[at], x[at + 1], to + 2 * at, out);
-                    });
-                else
-                    save_all<true>(x, to, route.zero + 2 * row, out.step);
-            }
-        }
-    }
-    /** The first pass over W rows, which become slots. */
-    template <int R>
-    static void pass_in(const FftPass& pass, const Route& route) {
-        const Gap gap{route.in_step, route.sign};
-        for (int p = 0; p < pass.count; p += 2) {
-            const int at = pair_of(p, pass.count);
-            C x[2][R];
-            each<R>([&](auto j)
-                        QUO_FFT_HERE { load_two(route.in + 2 * (at + j * pass.count), gap, x[0][j], x[1][j]); });
-            each<2>([&](auto i) QUO_FFT_HERE {
-                const FftRoot* const roots = pass.roots + (at + i) * (R - 1);
-                float* const to = route.out + (at + i) * R * kSlot;
-                butterfly<R>(x[i]);
-                save<false>(x[i][0], to);
-                each<R - 1>([&](auto k) QUO_FFT_HERE {
-                    save<false>(turn(x[i][k + 1], held(spread(roots[k]))), to + (k + 1) * kSlot);
+    static void whole_rows(const FftImage& rows, float sign) {
+        constexpr int kSquares = (2 * N + W - 1) / W;
+        for (std::ptrdiff_t row = 0; row < rows.count; row += W) {
+            C x[N];
+            const V conjugate = V{} + sign;
+            each<kSquares>([&](auto k) QUO_FFT_HERE {
+                constexpr int at = std::min(k * W / 2, N - W / 2);
+                V v[W];
+                load_square(rows.in + row * rows.step + 2 * at, rows.step, v);
+                each<W / 2>([&](auto i) QUO_FFT_HERE { x[at + i] = {v[2 * i], v[2 * i + 1] * conjugate}; });
+            });
+            butterfly<N>(x);
+            each<kSquares>([&](auto k) QUO_FFT_HERE {
+                constexpr int at = std::min(k * W / 2, N - W / 2);
+                V v[W];
+                each<W / 2>([&](auto i) QUO_FFT_HERE {
+                    v[2 * i] = x[at + i].re;
+                    v[2 * i + 1] = x[at + i].im * conjugate;
                 });
+                turn_square(v);
+                save_rows(v, rows.out + row * rows.step + 2 * at, rows.step);
             });
         }
     }
-    /** The last pass, whose slots become rows. */
-    template <int R>
-    static void pass_out(const FftPass& pass, const Route& route) {
-        const Gap gap{route.out_step, route.sign};
-        for (int q = 0; q < pass.stride; q += 2) {
-            const int at = pair_of(q, pass.stride);
-            C x[2][R];
-            each<2>([&](auto i) QUO_FFT_HERE {
-                each<R>([&](auto j) QUO_FFT_HERE {
-                    x[i][j] = load<false>(route.in + (at + i + j * pass.stride) * kSlot);
-                });
-                butterfly<R>(x[i]);
+    static void row_packs(const ShortFft& fft, const FftImage& rows, float* stage, float* work) {
+        const int floats = 2 * fft.length;
+        if (W <= 8 && fft.passes == 1)
+            return of_radix(fft.length, Radices{}, [&](auto length) {
+                whole_rows<std::max<int>(length, W / 2)>(rows, fft.backward ? -1.0F : 1.0F);
             });
-            each<R>([&](auto k)
-                        QUO_FFT_HERE { save_two(x[0][k], x[1][k], route.out + 2 * (at + k * pass.stride), gap); });
+        for (std::ptrdiff_t row = 0; row < rows.count; row += W) {
+            const float* const in = rows.in + row * rows.step;
+            float* const out = rows.out + row * rows.step;
+            for (int k = 0; k * W < floats; ++k)
+                turn_rows(in + lane_of(k, floats), rows.step, stage + lane_of(k, floats) * W, W);
+            run(fft, {stage, kSlot, false}, {stage, kSlot, false}, {}, work);
+            for (int k = 0; k * W < floats; ++k)
+                turn_rows(stage + lane_of(k, floats) * W, W, out + lane_of(k, floats), rows.step);
         }
     }
-    struct RowKernels {
-        PassKernel whole = nullptr, in = nullptr, out = nullptr, across = nullptr;
-    };
-    template <int... R>
-    static constexpr std::array<RowKernels, kRadices> row_table(std::integer_sequence<int, R...> /*radices*/) {
-        std::array<RowKernels, kRadices> table{};
-        // Rows that are transformed across have a sample for every lane at least.
-        ((table[R].in = pass_in<R>, table[R].across = whole_rows<std::max(R, W), false>), ...);
-        if constexpr (kShortRows) ((table[R].whole = whole_rows<R, true>, table[R].out = pass_out<R>), ...);
-        return table;
-    }
-    static const RowKernels& row_kernels(int radix) {
-        static constexpr auto kTable = row_table(Radices{});
-        return kTable[static_cast<std::size_t>(radix)];
-    }
-    /** Packs of W rows. */
-    static void row_packs(const ShortFft& fft, const FftImage& rows, float* work) {
-        const int together = fft.passes == 1 ? rows.count : W;
-        for (std::ptrdiff_t row = 0; row < rows.count; row += together)
-            run(fft, {rows.in + row * rows.step, rows.step, kAcross},
-                {rows.out + row * rows.step, rows.step, kAcross}, {}, work, together);
+    static void rows_of_two(const FftImage& rows) {
+        typedef float Four __attribute__((vector_size(16), aligned(4), may_alias));
+        for (std::ptrdiff_t row = 0; row < rows.count; ++row) {
+            const Four v = *reinterpret_cast<const Four*>(rows.in + row * rows.step);
+            *reinterpret_cast<Four*>(rows.out + row * rows.step) =
+                __builtin_shufflevector(v, v, 2, 3, 0, 1) + v * Four{1.0F, 1.0F, -1.0F, -1.0F};
+        }
     }
     static void short_rows(const FftSteps& fft, const FftImage& rows, float* room) noexcept {
         const std::ptrdiff_t floats = 2 * std::ptrdiff_t{fft.first.length}, step = rows.step;
-        const std::size_t bytes = sizeof(float) * static_cast<std::size_t>(floats);
         const int rest = rows.count % W, whole = rows.count - rest;
-        row_packs(fft.first, {rows.in, rows.out, step, whole}, room);
+        float *const stage = room, *const work = stage + fft.stage, *const spare = work + fft.work;
+        if (floats == 2) return move(rows.in, step, rows.out, step, rows.count, floats);
+        if (floats == 4) return rows_of_two(rows);
+        row_packs(fft.first, {rows.in, rows.out, step, whole}, stage, work);
         if (rest == 0) return;
         // The lanes that are left over repeat others.
-        float* const stage = room + fft.work;
         for (int row = 0; row < W; ++row)
-            std::memcpy(stage + row * floats, rows.in + (whole + row % rest) * step, bytes);
-        row_packs(fft.first, {stage, stage, floats, W}, room);
-        for (int row = 0; row < rest; ++row)
-            std::memcpy(rows.out + (whole + row) * step, stage + row * floats, bytes);
+            move(rows.in + (whole + row % rest) * step, 0, spare + row * floats, 0, 1, floats);
+        row_packs(fft.first, {spare, spare, floats, W}, stage, work);
+        move(spare, floats, rows.out + whole * step, step, rest, floats);
     }
 
-    static constexpr FftKernels kernels() {
-        if constexpr (kShortRows) return {{columns, rows, short_rows}};
-        return {{columns, rows, nullptr}};
-    }
+    static constexpr FftKernels kernels() { return {{columns, rows, short_rows}}; }
 #undef QUO_FFT_HERE
 #undef QUO_FFT_INLINE
 };
