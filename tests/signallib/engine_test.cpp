@@ -2,6 +2,9 @@
 #include <dlfcn.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <cstdint>
+#include <cstring>
 #include <string>
 
 #include "signallib/engines.h"
@@ -168,6 +171,39 @@ TEST(OwnFft, ARowHasTheBitsAloneThatItHasAmongOthers) {
         ASSERT_EQ(fft_c(n, n, kRows, kRows, -2, 0, rows.data(), rows.data()), 0);
         EXPECT_TRUE(std::equal(alone.begin(), alone.end(), rows.begin())) << n;
         EXPECT_TRUE(std::equal(alone.begin(), alone.end(), rows.end() - n)) << n;
+    }
+}
+
+// Columns of an image that no cache holds are stored past the caches: neither that nor where their lines begin may
+// show.
+TEST(OwnFft, AColumnHasTheBitsInALargeImageThatItHasInASmallOne) {
+    constexpr std::size_t kLength = 4096, kColumns = 2056, kFew = 40, kLine = 8;
+    for (const int lanes : {4, 8, 16}) {
+        if (!quo::fft_kernels(lanes)) continue;
+        const quo::FftTables tables{{quo::FftWay::Columns, kLength, true, lanes}};
+        const quo::Floats room = quo::allocate_floats(tables.room());
+        const auto transform = [&](fcomplex* image, std::size_t columns) {
+            auto* const floats = reinterpret_cast<float*>(image);
+            tables.run(floats, floats, static_cast<std::ptrdiff_t>(2 * columns), static_cast<int>(columns),
+                       room.get());
+        };
+        const Samples few = test::noise(kLength * kFew);
+        Samples alone = few;
+        transform(alone.data(), kFew);
+        for (const std::size_t skew : {std::size_t{0}, std::size_t{3}}) {
+            Samples large(kLength * kColumns + kLine + skew);
+            const auto begin = reinterpret_cast<std::uintptr_t>(large.data()) / sizeof(fcomplex) % kLine;
+            fcomplex* const image = large.data() + (kLine - begin) % kLine + skew;
+            for (std::size_t k = 0; k < kLength; ++k) {
+                std::copy_n(&few[k * kFew], kFew, image + k * kColumns);
+                std::copy_n(&few[k * kFew], kFew, image + (k + 1) * kColumns - kFew);
+            }
+            transform(image, kColumns);
+            for (std::size_t k = 0; k < kLength; ++k)
+                for (const std::size_t first : {k * kColumns, (k + 1) * kColumns - kFew})
+                    ASSERT_EQ(std::memcmp(image + first, &alone[k * kFew], kFew * sizeof(fcomplex)), 0)
+                        << lanes << " lanes, skew " << skew << ", row " << k;
+        }
     }
 }
 

@@ -8,7 +8,7 @@
 #include <cstdint>
 #include <cstring>
 #include <utility>
-#if defined(__FMA__)
+#if defined(__SSE2__)
 #include <immintrin.h>
 #endif
 
@@ -346,6 +346,31 @@ struct LaneFfts {
         }
     }
 
+    /** The same of whole strips to an image that no cache holds until it is read again: past the caches, which
+     * would fetch the lines first. */
+    static void move_past_caches(const float* from, std::ptrdiff_t from_step, float* to, std::ptrdiff_t to_step,
+                                 int rows) {
+#if defined(__SSE2__)
+        for (int row = 0; row < rows; ++row, from += from_step, to += to_step)
+            each<2 * kStripPacks>([&](auto k) QUO_FFT_HERE {
+                const V v = *reinterpret_cast<const Loose*>(from + k * W);
+                if constexpr (W == 16) _mm512_stream_ps(to + k * W, __m512(v));
+                if constexpr (W == 8) _mm256_stream_ps(to + k * W, __m256(v));
+                if constexpr (W == 4) _mm_stream_ps(to + k * W, __m128(v));
+            });
+        _mm_sfence();
+#else
+        move(from, from_step, to, to_step, rows, kStripPacks * kSlot);
+#endif
+    }
+    /** Whether a strip stands in whole lines of such an image. */
+    static bool passes_caches(const FftSteps& fft, const FftImage& columns) {
+        constexpr std::ptrdiff_t kMostCached = 1 << 24;  // floats
+        return columns.count == kStripPacks * W && columns.step % kLine == 0 &&
+               reinterpret_cast<std::uintptr_t>(columns.out) % (kLine * sizeof(float)) == 0 &&
+               columns.step * fft.first.length * fft.second.length > kMostCached;
+    }
+
     /** So many columns in two steps, a pack of those that are split behind the other: through a stage whose rows
      * lie close together. */
     static void two_steps(const FftSteps& fft, const FftImage& columns, float* room) {
@@ -353,6 +378,7 @@ struct LaneFfts {
         const std::ptrdiff_t step = columns.step, floats = 2 * std::ptrdiff_t{columns.count};
         const std::ptrdiff_t stage_step = packs * kSlot, tile_row = packs * fft.pitch * kSlot;
         float *const work = room, *const stage = work + fft.work, *const tile = stage + fft.stage;
+        const bool past = passes_caches(fft, columns);
         for (int i = 0; i < n1; ++i) {
             const float* const in = columns.in + i * step;
             move(in, n1 * step, stage, stage_step, n2, floats, step);
@@ -366,7 +392,10 @@ struct LaneFfts {
             for (int b = 0; b < packs; ++b)
                 run(fft.second, {tile + (k * packs + b) * fft.pitch * kSlot, kSlot, false},
                     {stage + b * kSlot, stage_step, true}, {}, work);
-            move(stage, stage_step, out, n2 * step, n1, floats, step);
+            if (past)
+                move_past_caches(stage, stage_step, out, n2 * step, n1);
+            else
+                move(stage, stage_step, out, n2 * step, n1, floats, step);
         }
     }
     /** Whole packs, of which more than one are a single pass; or no more columns than lanes. */
