@@ -191,7 +191,7 @@ struct LaneFfts {
     // --------------------------------------------------------------------------------------------------
 
     /** What results are turned by, if anything: all lanes by one root, or each by its own, in slots. With these,
-     * as much of what comes `next` is asked for, into the second cache. */
+     * half as much of what comes `next` is asked for, into the second cache. */
     struct Outer {
         const FftRoot* roots = nullptr;
         const float* lanes = nullptr;
@@ -321,7 +321,7 @@ struct LaneFfts {
     // --- Transforms down the lanes
     // -------------------------------------------------------------------------------
 
-    static constexpr std::ptrdiff_t kLine = 16;
+    static constexpr std::ptrdiff_t kLine = 16;  ///< floats of a line of the cache
     template <int Nearness = 3>
     QUO_FFT_INLINE void ask(const float* row, std::ptrdiff_t floats) {
         for (std::ptrdiff_t k = 0; k < floats; k += kLine) __builtin_prefetch(row + k, 0, Nearness);
@@ -409,17 +409,17 @@ struct LaneFfts {
         run(fft.first, {stage, kSlot, true}, {stage, kSlot, true}, {}, room);
         move(stage, kSlot, columns.out, step, fft.first.length, floats);
     }
-    /** Columns between the beginning of a line of the cache, or of a pack, and the first; where rows differ, none
-     * is better than another. */
-    static int skew(const FftImage& columns) {
+    /** Columns between the beginning of a line of the cache, or of a narrower strip, and the first; where rows
+     * differ, none is better than another. */
+    static int skew(const FftImage& columns, int strip) {
         const auto first = reinterpret_cast<std::uintptr_t>(columns.in) / sizeof(FftRoot);
-        return columns.step % kLine == 0 ? static_cast<int>(first % std::min(W, 8)) : 0;
+        return columns.step % kLine == 0 ? static_cast<int>(first % std::min(strip, 8)) : 0;
     }
-    /** After the first ones, packs begin with a line of the cache. */
+    /** After the first strip, all begin with a line of the cache. */
     static void columns(const FftSteps& fft, const FftImage& columns, float* room) noexcept {
         const bool two = fft.two();
         const int strip = two ? kStripPacks * W : W;
-        int width = strip - skew(columns);
+        int width = strip - skew(columns, strip);
         for (std::ptrdiff_t c = 0; c < columns.count; c += width, width = strip) {
             const int left = columns.count - static_cast<int>(c);
             if (!two && fft.first.passes == 1 && left > W && width == strip) width = left / W * W;
@@ -496,7 +496,8 @@ struct LaneFfts {
                 {nullptr, fft.turns + b * share, next ? next + b * share / 2 : nullptr}, work);
         }
     }
-    /** Step 2: W results are the lanes. */
+    /** Step 2: W results are the lanes. The other half of what comes `next` is asked for: all at once would keep
+     * waiting what is needed here. */
     static void across_results(const FftSteps& fft, const float* tile, float* out, const float* next, float* stage,
                                float* work) {
         const int n1 = fft.second.length, n2 = fft.first.length;
@@ -512,7 +513,7 @@ struct LaneFfts {
         }
     }
     static void rows(const FftSteps& fft, const FftImage& rows, float* room) noexcept {
-        constexpr int kMostAsked = 1 << 14;
+        constexpr int kMostAsked = 1 << 14;  // samples: the second cache has no room for the next of longer rows
         float *const tile = room, *const stage = tile + fft.tile, *const work = stage + fft.stage;
         for (std::ptrdiff_t row = 0; row < rows.count; ++row) {
             const float* const in = rows.in + row * rows.step;
@@ -569,6 +570,7 @@ struct LaneFfts {
                 turn_rows(stage + lane_of(k, floats) * W, W, out + lane_of(k, floats), rows.step);
         }
     }
+    /** Sums and differences of four floats, which need no lanes. */
     static void rows_of_two(const FftImage& rows) {
         typedef float Four __attribute__((vector_size(16), aligned(4), may_alias));
         for (std::ptrdiff_t row = 0; row < rows.count; ++row) {
