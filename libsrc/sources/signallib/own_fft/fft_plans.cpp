@@ -94,9 +94,10 @@ Split split(PassChoice& passes, int length, int lanes) {
  * rows. Registers that hold a whole transform are best eight lanes wide. */
 double short_rows_cost(PassChoice& passes, int length, int lanes) {
     const bool wide = lanes == 16;
-    if (lanes > 2 * length || (wide && passes.of(length).radices.size() < 2))
+    const int side = lanes / 2;  // samples of a square
+    if (side > length || (wide && passes.of(length).radices.size() < 2))
         return length == 1 ? 0.0 : std::numeric_limits<double>::infinity();
-    const double squares = static_cast<double>(packs_of(2 * length, lanes)) * lanes / (2.0 * length);
+    const double squares = static_cast<double>(packs_of(length, side)) * side / length;
     const int beyond = std::max(length - kCachedShortRows / lanes, 0);
     return passes.of(length).cost + (wide ? 13.0 : 10.0) * squares + (wide ? 0.5 : 0.18) * beyond;
 }
