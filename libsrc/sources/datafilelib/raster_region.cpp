@@ -140,9 +140,9 @@ void convert_from_memory(const RegionLayout& layout, std::int64_t piece, const c
     constexpr std::int64_t kSmall = 1024, kAhead = 8 * kSmall, kLine = 64;
     const std::int64_t in = layout.memory_piece / layout.samples, out = piece / layout.samples, few = kSmall / in;
     for (std::int64_t i = 0; i < layout.samples; i += few) {
-        for (std::int64_t k = 0; k < kSmall; k += kLine) __builtin_prefetch(from + i * in + kAhead + k);
-        layout.kernel(from + i * in, to + i * out, static_cast<std::size_t>(std::min(few, layout.samples - i)),
-                      layout.swap);
+        const std::int64_t count = std::min(few, layout.samples - i);
+        for (std::int64_t k = 0; k < count * in; k += kLine) __builtin_prefetch(from + i * in + kAhead + k);
+        layout.kernel(from + i * in, to + i * out, static_cast<std::size_t>(count), layout.swap);
     }
 }
 

@@ -3,7 +3,6 @@
 #define QUO_LANE_FFT_H
 
 #include <algorithm>
-#include <array>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
@@ -490,11 +489,9 @@ struct LaneFfts {
     static void across_samples(const FftSteps& fft, const float* in, const float* next, float* tile, float* work) {
         const int n1 = fft.second.length;
         const std::ptrdiff_t share = fft.first.length * kSlot;
-        for (int lane = 0, b = 0; b * W < n1; ++b, tile += share) {
-            lane = lane_of(b, n1);
-            run(fft.first, {in + 2 * lane, 2 * std::ptrdiff_t{n1}, true}, {tile, kSlot, false},
+        for (int b = 0; b * W < n1; ++b, tile += share)
+            run(fft.first, {in + 2 * lane_of(b, n1), 2 * std::ptrdiff_t{n1}, true}, {tile, kSlot, false},
                 {nullptr, fft.turns + b * share, next ? next + b * share / 2 : nullptr}, work);
-        }
     }
     /** Step 2: W results are the lanes. The other half of what comes `next` is asked for: all at once would keep
      * waiting what is needed here. */
